@@ -1,0 +1,48 @@
+// Pragmas and option sets as the I-file carries them.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+// The pragma kinds that this system knows by number. The other kinds up to 128 pass through unchanged.
+enum PRAGMA_KIND : uint8_t {
+    PRG_DATA_ALIGN = 0,
+    PRG_FUNC_NEVER_RETURNS = 3,
+    PRG_FUNC_CANNOT_INLINE = 4,
+    PRG_FUNC_NO_GLOBAL_ASG = 5,
+    PRG_FUNC_NO_IND_ASG = 6,
+    PRG_FUNC_IS_PURE = 7,
+    PRG_FUNC_IS_SYSTEM = 8,
+    PRG_FUNC_EXT_CALLED = 23,
+    PRG_OPT_OVERRIDE = 36,
+    PRG_SRC_LANGUAGE = 49,
+    PRG_FL_STATIC = 51,
+    PRG_SYM_IS_REFERENCED = 52,
+    PRG_FUNC_IS_NONCONFORMING = 54,
+    PRG_LOOP_FLAGS = 57,
+    PRG_SYM_IS_DEAD = 59,
+    PRG_SYM_VISIBILITY = 72,
+    PRG_FS_DYNAMIC_INIT = 74,
+    PRG_FUNC_ESPEC = 75,
+    PRG_FUNC_SYNONYM = 78,
+    PRG_FUNC_RET_BY_CCTOR = 81,
+    PRG_WEAK = 83,
+    PRG_FUNC_NUM_CALLED = 87,
+    PRG_LAST = 128,
+};
+
+struct PRAGMA {
+    uint8_t kind = 0;
+    std::vector<std::string> args;
+    PRAGMA* next = nullptr;
+
+    // The kind's name, "unknown" for one beyond the table.
+    const char* name() const { return name(kind); }
+    static const char* name(unsigned kind);
+};
+
+struct OPTION_SET {
+    unsigned id = 0;
+    std::vector<std::string> options;
+};

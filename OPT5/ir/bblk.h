@@ -1,0 +1,112 @@
+// Basic blocks, edges and the control-flow graph of the current function.
+//
+// Each block ends in exactly one control statement: RETURN, URETURN, BRANCH, IF or SWITCH; only the exit block holds
+// URETURN. `FUNINFO::bb_list` is the entry block. `dfn` numbers are valid after `renumber_bblocks`, from 1 to `bb_count`;
+// a pass that inserts blocks calls it again before it indexes arrays by `dfn`.
+#pragma once
+
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/list.h"
+#include "OPT5/ir/node.h"
+#include "OPT5/ir/serial_object.h"
+
+#include <cstdint>
+#include <cstdio>
+#include <map>
+#include <string>
+#include <vector>
+
+class BITVEC;
+class BBLK;
+
+struct EDGE {
+    BBLK* first = nullptr; // the block at the other end
+    double prob = -1.0;    // -1.0 if unknown
+    EDGE* rest = nullptr;
+};
+
+class BBLK : public serial_object<BBLK, FUNINFO> {
+public:
+    void* fn = nullptr; // the LIR function when the block is in LIR form
+    BBLK* dflink = nullptr;
+    BBLK* rdflink = nullptr;
+    BBLK* uolink = nullptr;
+    LIST* statements = nullptr;
+    EDGE* predecessors = nullptr;
+    EDGE* successors = nullptr;
+    EDGE* cursor = nullptr;
+    LBL* label = nullptr; // chained through LBL::next, owned
+    struct LOOP* loop = nullptr;
+    void* lcv = nullptr;
+    NODE* trips = nullptr;
+    INT65 increment;
+    // Live in, live out, use, def and three working sets.
+    BITVEC* live_sets[7] = {};
+    EDGE* descendants = nullptr;
+    PSN* first_psn = nullptr;
+    PSN* last_psn = nullptr;
+    void* trace = nullptr;
+    double dFreqIn = -1.0, dFreqOut = -1.0;
+    int uon = 0; // source order number from 1; -1 for a block made after `buildcfg`
+    int dfn = 0;
+    int depth = 0;
+    bool visited = false;
+    int cycle_count = -1;
+
+    explicit BBLK(FUNINFO* owner) : serial_object(owner) {}
+    ~BBLK();
+    FUNINFO* owner() const { return manager; }
+    bool is_in_LIR_form() const { return fn != nullptr; }
+    const char* str() const; // "BB<dfn>", with the serial number under debug:dump_serial; rotating static buffers
+    LIST* last_statement() const; // null for an empty block
+    NODE* branch() const;         // the tree of the last statement, or null
+};
+
+// ---- Building and numbering
+void buildcfg();
+void rebuildcfg();
+void renumber_bblocks();
+BBLK* mkbblock(LIST* list, BBLK* next, FUNINFO* funinfo);
+BBLK* insert_new_bb(int uon, BBLK* after, LIST* list);
+BBLK* insert_new_bb_with_branch(int uon, BBLK* after, BBLK* target, PSN* psn);
+void delink_old_bb(BBLK* bb);
+void erase_bblock(BBLK* bb); // its statements, labels and edges; the object stays
+void clear_visited();
+
+// ---- Edges
+EDGE* mkedge(BBLK* bb, EDGE* rest);
+EDGE* add_edge(BBLK* bb, EDGE* list, double prob = -1.0); // unless `bb` is on the list
+EDGE* remove_edge(BBLK* bb, EDGE* list);
+EDGE* edge_memberp(const BBLK* bb, EDGE* list);
+int edge_length(const EDGE* list);
+EDGE* rev_edge_list(EDGE* list);
+EDGE* sort_edge_list(EDGE* list);
+EDGE* fast_sort_edge_list(EDGE* list);
+EDGE* copy_edge_list(const EDGE* list);
+void erase_edge(EDGE* edge);
+void erase_edge_list(EDGE* list);
+void connect(BBLK* from, BBLK* to);    // both lists; marks the dominators dirty
+void disconnect(BBLK* from, BBLK* to);
+BBLK* split_cfg_edge(BBLK* a, BBLK* b);
+void split_critical_edges(bool all);
+bool bb_is_split_critical_edge(const BBLK* bb);
+void subst_bb_for_bb_in_bb(BBLK* to, BBLK* from, BBLK* in);
+void subst_bb_for_bb_in_stmts(BBLK* to, BBLK* from, LIST* list);
+void remap_labelrefs(NODE* tree, LBL* from, LBL* to);
+bool BB_is_in_bb_list(const BBLK* bb);
+void fixup_edge_lists(BBLK* bb, NODE* tree);
+EDGE* list_branch_targets(NODE* tree, EDGE* list);
+
+// ---- Labels
+extern int internal_label_index; // which counter of the current function fresh labels take
+extern std::map<int32_t, LBL*> label_mapping;
+LBL* find_label(int32_t index);
+LBL* mklabel(int32_t index, NODE* tree, BBLK* bb); // index 0 or below: a fresh internal label
+LBL* label_of_bb(BBLK* bb); // the block's first label, made if it has none
+
+// ---- Checks and dumps
+// Prints what is wrong to the debug stream, or to stderr without one; returns the number of uncorrected errors.
+int validate_cfg();
+int validate_stmts();
+void prbblocks(BBLK* first, BBLK* last); // block structure to the debug stream
+void prbbinfix(FILE* out);               // every block of the current function with its statements in infix form

@@ -1,0 +1,32 @@
+// Statement lists.
+#pragma once
+
+#include "UTIL/psn.h"
+
+#include <cstddef>
+#include <cstdint>
+
+class NODE;
+
+// One statement. A cell owns its tree; a list is owned by its block, or by FUNINFO::statements before the graph exists.
+struct LIST {
+    NODE* first = nullptr;
+    PSN* psn = nullptr;
+    uint16_t flag1 = 0;
+    uint16_t flag2 = 0;
+    LIST* rest = nullptr;
+
+    static void* operator new(std::size_t size);
+    static void operator delete(void* p);
+};
+
+struct LLIST {
+    LIST* list;
+    LLIST* next;
+};
+
+LIST* mkelist(NODE* tree, LIST* rest, PSN* psn);
+LIST* mklist(NODE* tree, LIST* rest, uint16_t flag1, uint16_t flag2);
+LLIST* mklistlist(LIST* list, LLIST* next);
+LIST* reverse_list(LIST* list); // in place
+LIST* last_cell(LIST* list);    // null for an empty list

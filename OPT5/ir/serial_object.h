@@ -1,0 +1,29 @@
+// serial_object<T, Manager>: an object with a serial number within its manager, never reused.
+#pragma once
+
+#include <cstddef>
+#include <vector>
+
+// The manager's side: all objects by serial number; a slot is null once its object is gone.
+template <class T, class Manager> class serial_namespace {
+public:
+    std::vector<T*> objects;
+    void clear() { objects.clear(); }
+};
+
+template <class T, class Manager> class serial_object {
+public:
+    const unsigned serial;
+    Manager* const manager;
+
+    serial_object(const serial_object&) = delete;
+    serial_object& operator=(const serial_object&) = delete;
+
+protected:
+    explicit serial_object(Manager* owner) : serial(static_cast<unsigned>(owner->objects.size())), manager(owner) {
+        owner->objects.push_back(static_cast<T*>(this));
+    }
+    ~serial_object() {
+        if (serial < manager->objects.size()) manager->objects[serial] = nullptr;
+    }
+};

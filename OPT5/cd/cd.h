@@ -1,0 +1,11 @@
+// Region graphs: vectorization, unrolling and instruction-level parallelism by the target's rules.
+#pragma once
+
+struct LOOP;
+
+void do_cd_vectorization();
+void do_cd_ilp();
+void cd_unroll_loops_by_request();
+void cd_unroll_loops_for_speed(bool completely);
+
+void fuse_loops_at_loop_level(LOOP* loop);

@@ -1,0 +1,8 @@
+// Vector operations in trees: disclosed as operators for the optimizer, disguised as intrinsics for the code generator.
+#pragma once
+
+void disguise_vector_operations();
+void disclose_vector_operations(bool all);
+
+void coalesce_local_vector_symbols();
+void lower_vector_statements();

@@ -1,0 +1,38 @@
+// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
+// meaning, and what is not known is assumed not to hold.
+#include "OPT5/dd/dd.h"
+
+void build_loop_hierarchy(bool, bool, bool, bool) {}
+void unbuild_loop_hierarchy() {}
+void erase_loop_hierarchy() {}
+void reinsert_loop_pragmas() {}
+NODE* normalize_tree(NODE* tree, NODE*) { return tree; }
+NODE* denormalize_tree(NODE* tree, bool) { return tree; }
+void construct_SSA_form(bool, bool, bool) {}
+void deconstruct_SSA_form() {}
+void clone_SSA_NASSERTs() {}
+void propagate_SSA_constants(int) {}
+void eliminate_dead_SSA_assignments() {}
+void hoist_SSA_region_constants() {}
+void promote_vars_to_registers(bool) {}
+void init_dependence_analysis() {}
+void wrapup_dependence_analysis(bool) {}
+void report_all_dependences() {}
+void report_ambiguous_aliases(LOOP*) {}
+void find_loop_assertions(LOOP*) {}
+bool sink_unused_definitions(LOOP*) { return false; }
+void undeltafy_dd_loops(LOOP*) {}
+void add_downcounters_to_loops(LOOP*, bool, bool) {}
+void collapse_dd_loops(LOOP*) {}
+void sr_circular_addressing_in_loop(LOOP*) {}
+void sr_DIV_and_MOD_in_loop(LOOP*, bool) {}
+void do_loop_if_interchange(LOOP*) {}
+void unroll_and_jam_loop_nest(LOOP*, bool, bool) {}
+void unroll_loops_for_SP(LOOP*) {}
+void interleave_reductions_in_loop(LOOP*, bool) {}
+void explode_local_arrays() {}
+void special_DMAC_conversion() {}
+void rotate_loops_for_accumulators() {}
+void do_dd_analysis_for_be() {}
+void finalize_dd_edges() {}
+void do_DVE_unit_testing() {}

@@ -1,0 +1,55 @@
+// Loops: hierarchy, dependence, SSA form, induction variables, and the transformations on them.
+#pragma once
+
+class NODE;
+struct LOOP;
+
+// The hierarchy's root is held by the first block, null without.
+void build_loop_hierarchy(bool full, bool ssa, bool scalars, bool pragmas);
+void unbuild_loop_hierarchy();
+void erase_loop_hierarchy();
+void reinsert_loop_pragmas();
+
+// The normal form that loop work runs on. Both consume the tree and return what it became.
+NODE* normalize_tree(NODE* tree, NODE* statement);
+NODE* denormalize_tree(NODE* tree, bool keep_ddnodes);
+
+// SSA form of the current function and the passes on it.
+void construct_SSA_form(bool with_memory, bool with_fields, bool scalars_only);
+void deconstruct_SSA_form();
+void clone_SSA_NASSERTs();
+void propagate_SSA_constants(int mode);
+void eliminate_dead_SSA_assignments();
+void hoist_SSA_region_constants();
+void promote_vars_to_registers(bool with_assertions);
+
+// Dependence analysis is active between these two.
+void init_dependence_analysis();
+void wrapup_dependence_analysis(bool keep);
+void report_all_dependences();
+void report_ambiguous_aliases(LOOP* loop);
+
+// The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
+void find_loop_assertions(LOOP* loop);
+bool sink_unused_definitions(LOOP* loop);
+void undeltafy_dd_loops(LOOP* loop);
+void add_downcounters_to_loops(LOOP* loop, bool recurse, bool all);
+void collapse_dd_loops(LOOP* loop);
+void sr_circular_addressing_in_loop(LOOP* loop);
+void sr_DIV_and_MOD_in_loop(LOOP* loop, bool recurse);
+void do_loop_if_interchange(LOOP* loop);
+void unroll_and_jam_loop_nest(LOOP* loop, bool recurse, bool all);
+void unroll_loops_for_SP(LOOP* loop);
+void interleave_reductions_in_loop(LOOP* loop, bool recurse);
+void explode_local_arrays();
+
+// Forms of the dual multiply-accumulate and its accumulators.
+void special_DMAC_conversion();
+void rotate_loops_for_accumulators();
+
+// Dependence information for the code generator.
+void do_dd_analysis_for_be();
+void finalize_dd_edges();
+
+// Self-check of the dependence vectors, for the debug stream.
+void do_DVE_unit_testing();

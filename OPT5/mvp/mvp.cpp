@@ -1,0 +1,12 @@
+// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
+// meaning, and what is not known is assumed not to hold.
+#include "OPT5/mvp/mvp.h"
+
+void initialize_ssa_pointsto_mvp() {}
+void do_integer_value_propagation() {}
+void wrap_up_ssa_pointsto_mvp() {}
+void init_IP_MVP_for_current_function() {}
+void add_MVP_IP_global_assertions() {}
+void beta_parms_using_mvp_ip() {}
+void beta_convert_using_mvp_ip() {}
+void finalize_ldspec_advice() {}

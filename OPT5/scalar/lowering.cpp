@@ -1,0 +1,15 @@
+// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
+// meaning, and what is not known is assumed not to hold.
+#include "OPT5/scalar/lowering.h"
+
+void expand_bitfields() {}
+void explode_auto_struct_vars() {}
+void transform_DIVs_by_ICONs() {}
+void convert_sti_to_cinit() {}
+void build_stack_sharing_type() {}
+void subst_csu_returning_temp_for_local_var() {}
+void unsimplify() {}
+void promote_all_embedded_assignments() {}
+void expand_cluster_refs() {}
+void collect_clustered_symbols() {}
+void add_instrumentation_exit_routine_to_atexit() {}

@@ -1,0 +1,33 @@
+// Passes that rewrite forms of the source into plainer ones, and back ahead of the output.
+#pragma once
+
+// Bit-field accesses become operations on their containers.
+void expand_bitfields();
+
+// A local structure becomes a set of variables.
+void explode_auto_struct_vars();
+
+// Divisions by constants become multiplications where the target gains.
+void transform_DIVs_by_ICONs();
+
+// Assignments of a static-initializer function become initial values.
+void convert_sti_to_cinit();
+
+// Lays the locals of disjoint scopes out in one aggregate.
+void build_stack_sharing_type();
+
+// The temporary that takes a structure result gives way to the variable that it is copied to.
+void subst_csu_returning_temp_for_local_var();
+
+// Simplifier forms that the code generator does not want are undone.
+void unsimplify();
+
+// Assignments inside expressions become statements of their own.
+void promote_all_embedded_assignments();
+
+// References to clustered symbols; clustering is no part of this family.
+void expand_cluster_refs();
+void collect_clustered_symbols();
+
+// Registers the exit routine of the instrumentation in `main`.
+void add_instrumentation_exit_routine_to_atexit();

@@ -1,0 +1,4 @@
+// Value-set propagation: which integers a variable may hold.
+#pragma once
+
+void do_value_propagation();

@@ -1,7 +1,7 @@
 // The tool chain's message layer: numbered messages with severities, a header, word wrapping, and an error limit.
 //
-// A message is an object on the stack for the time of its report: it prints its header, its text, and ends its line. The
-// end of the line counts errors; a fatal message ends the process there.
+// A message is an object on the stack for the time of its report: it prints its header, its text, and ends its line.
+// The end of the line counts errors; a fatal message ends the process there.
 #pragma once
 
 #include <cstdarg>
@@ -76,7 +76,7 @@ public:
     DIAGNOSTIC* set_src(const DIAG_SRCINFO* src); // stores a copy; null leaves it out
     void print_header();
     int print(const char* format, ...) __attribute__((format(printf, 2, 3))); // characters written
-    int flush();                                                             // ends the line; 0 if there is none
+    int flush();                                                              // ends the line; 0 if there is none
     void start_new_line();
     bool suppress() const;
     FILE* fp() const;
@@ -96,8 +96,8 @@ public:
     static void pop_indent();
 
     static int diag_cols_m, wrap_indent_m, indent_m, max_errors_m;
-    static bool wrap_enabled_m, wrap_headers_m, warnings_m, remarks_m, advice_m, debug_m, display_code_m, display_ipos_m,
-        verbose_m;
+    static bool wrap_enabled_m, wrap_headers_m, warnings_m, remarks_m, advice_m, debug_m, display_code_m,
+        display_ipos_m, verbose_m;
     static bool debug_mode_m; // messages neither count nor end the run
     static FILE* fp_m;        // null: standard output below warnings, standard error from there on
     static int error_count_m;
@@ -111,8 +111,8 @@ protected:
     bool header_done = false;
 
 private:
-    static int print_formatted(const char* text, FILE* stream, std::string* buffer, int* cols_left, int cols, int indent,
-                               int wrap_indent);
+    static int print_formatted(const char* text, FILE* stream, std::string* buffer, int* cols_left, int cols,
+                               int indent, int wrap_indent);
     std::string srcinfo_str() const;
     void show_annotated_source() const;
 
@@ -192,7 +192,8 @@ public:
     void advice(const char* format, ...) __attribute__((format(printf, 2, 3)));
     void advice(const DIAG_SRCINFO* src, const char* format, ...) __attribute__((format(printf, 3, 4)));
     void warning(unsigned number, const char* format, ...) __attribute__((format(printf, 3, 4)));
-    void warning(const DIAG_SRCINFO* src, unsigned number, const char* format, ...) __attribute__((format(printf, 4, 5)));
+    void warning(const DIAG_SRCINFO* src, unsigned number, const char* format, ...)
+        __attribute__((format(printf, 4, 5)));
     void error(const char* format, ...) __attribute__((format(printf, 2, 3)));
     void error(const DIAG_SRCINFO* src, const char* format, ...) __attribute__((format(printf, 3, 4)));
     void apperror(const char* format, ...) __attribute__((format(printf, 2, 3)));

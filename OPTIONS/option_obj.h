@@ -27,7 +27,9 @@ public:
     enum option_value : int {
 #define ITEMLIST(list)
 #define ITEM(list, name, word, value) OV_##list##_##name = value,
+#define ITEMLIST_END
 #include "OPTIONS/option_items.def"
+#undef ITEMLIST_END
 #undef ITEM
 #undef ITEMLIST
     };
@@ -101,7 +103,7 @@ public:
         const char* forms[10]; // spellings with their hyphens, primary first, the rest null
         const char* arg_text;  // the argument's name in messages and help
         bool has_arg;
-        const char* help[2];  // one line; a longer text or null
+        const char* help[2];    // one line; a longer text or null
         unsigned char flags[8]; // [2]: persistent, cannot be cleared
         const option_item* items;
         arg_range range;
@@ -124,7 +126,9 @@ public:
     static const char* const class_descriptions[CLASS_COUNT];
 #define ITEMLIST(list) static const option_item OO_##list##_ITEMLIST[];
 #define ITEM(list, name, word, value)
+#define ITEMLIST_END
 #include "OPTIONS/option_items.def"
+#undef ITEMLIST_END
 #undef ITEM
 #undef ITEMLIST
     static int conflicts(int id, int other);       // 0 none, 1 clears in silence, 2 with a warning, 3 an error
@@ -132,7 +136,7 @@ public:
 
     // ---- The program that parses
     static const char* executable_name;
-    static const char* (*next_arg)(); // next word of the command line, or null
+    static const char* (*next_arg)();                                      // next word of the command line, or null
     static std::map<std::string, std::string> tool_cmd_map;                // tool to its command
     static std::map<std::string, std::vector<std::string>> tn_fileopt_map; // tool to options given for it
 
@@ -141,8 +145,8 @@ public:
     // ---- Parsing. `word` is the option less its first hyphen.
     // True when the whole word was consumed; otherwise `*rest`, if given, is the place that no option accepts.
     bool process_option(const char* word, const char** rest);
-    // Reads and stores the argument of option `id`. `text` is what follows the option's name. Ends the run with status 1
-    // on an argument that is missing or not acceptable.
+    // Reads and stores the argument of option `id`. `text` is what follows the option's name. Ends the run with status
+    // 1 on an argument that is missing or not acceptable.
     void parse_arg(int id, const char* text, const char* option_name, parse_option_type type, const arg_range* range);
     void parse_oneof(int id, const char* text, const char* option_name);
     void check_numerical_arg(int id, const char* text, const char* option_name, bool is_signed, const arg_range* range);
@@ -172,8 +176,8 @@ public:
 
     // ---- Reading
     bool getopt(int id) const { return valid(id) && state[id] > 0; }
-    long getnumarg(int id, unsigned index = 0) const;            // 0 if there is none
-    const char* getstrarg(int id, unsigned index = 0) const;     // null if there is none
+    long getnumarg(int id, unsigned index = 0) const;        // 0 if there is none
+    const char* getstrarg(int id, unsigned index = 0) const; // null if there is none
     unsigned getargcount(int id) const;
     static bool isclass(int id, class_id c);
     bool testclass(class_id c) const; // any member present
@@ -199,7 +203,7 @@ public:
     void do_merge_conflicts(int id, const option_obj& other, const char* file);
 
     // ---- Output
-    void print() const; // as option words, one a line, on standard output
+    void print() const;       // as option words, one a line, on standard output
     void dump(int all) const; // names, states and arguments on standard output; `all`: absent options too
     void dump_history() const;
     static void display_option_help(int, int, int);

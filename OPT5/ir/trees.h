@@ -28,7 +28,8 @@ NODE* mk_EXCLAIM(NODE* t);
 NODE* mk_MINUS(NODE* a, NODE* b);
 NODE* mk_ICALL(const char* name, NODE* args, TYPE* type);
 NODE* mk_MCALL(const char* name, NODE* args, TYPE* type);
-NODE* mk_IF(NODE* cond, int32_t true_index, uint32_t true_profile, int32_t false_index, uint32_t false_profile, LS* ls = nullptr);
+NODE* mk_IF(NODE* cond, int32_t true_index, uint32_t true_profile, int32_t false_index, uint32_t false_profile,
+            LS* ls = nullptr);
 NODE* mk_IF(NODE* cond, NODE* true_labelref, NODE* false_labelref, LS* ls = nullptr);
 NODE* mk_ASM(int kind, const char* text); // kind 47 a comment, 36 inline assembly
 NODE* ASG_to_opASG(NODE* tree);
@@ -44,7 +45,10 @@ SYMTAB* get_callee_for_call(const NODE* call); // of CALL or UCALL through UAND(
 NODE* get_arguments_to_call(const NODE* call);
 
 // ---- Queries
-bool tree_has_side_effects(const NODE* t);
+bool tree_has_side_effects(const NODE* t);    // a volatile read is one
+bool lvalue_is_volatile(const NODE* t);       // of NAME, UMULT, STDOT, STREF, by the node, its object and `volit_vars`
+bool is_def_assert_ICALL_tree(const NODE* t); // a fact attached to a value: ICALL "def$assert"(value, fact, text)
+bool tree_is_trivially_invertible(const NODE* t); // has an operator for its logical opposite
 bool trees_are_congruent(const NODE* a, const NODE* b, bool se_ok);
 inline bool trees_are_congruent_se_ok(const NODE* a, const NODE* b) { return trees_are_congruent(a, b, true); }
 bool bools_are_congruent(const NODE* a, const NODE* b, bool negated, bool se_ok);
@@ -64,22 +68,28 @@ bool tree_contains_matching_node(const NODE* t, bool (*predicate)(const NODE*));
 bool tree_has_DDNODE_subtrees(const NODE* t);
 bool tree_is_subtree_of_tree(const NODE* a, const NODE* b);
 bool tree_is_strict_subtree_of_tree(const NODE* a, const NODE* b);
+// All nodes; without leaves, and the hidden state argument of machine calls, for `skip_leaves`; without the root and
+// the COMMAs below it, which only hold a statement together, for `statement_spine`.
 int count_nodes_in_tree(const NODE* t, bool skip_leaves = false, bool statement_spine = false);
 int count_lvalues_in_tree(const NODE* t, const NODE* lvalue);
 int count_calls_in_tree(const NODE* t);
-long byte_offset_on_indirection(const NODE* t); // 16-bit units
+// The sum of the constant terms of an lvalue's address or of a pointer, in 16-bit units.
+long byte_offset_on_indirection(const NODE* t);
+// Stores that sum; false if the pointer is not one base plus constants, or a term does not fit.
 bool total_pointer_offset_value(const NODE* t, INT65* offset);
-bool pointer_is_an_adcon(const NODE* t);
-bool pointer_contains_adcon_term(const NODE* t);
-bool lvalue_is_a_ref_parm(const NODE* t);
-bool tree_addresses_an_argument(const NODE* t);
+bool pointer_is_an_adcon(const NODE* t);         // known before the run, up to linking
+bool pointer_contains_adcon_term(const NODE* t); // the address of an object plus something, so never null
+bool lvalue_is_a_ref_parm(const NODE* t);        // what a pointer parameter points to
+bool tree_addresses_an_argument(const NODE* t);  // takes the address of a parameter or its local copy
+// A parameter (level 1) and the local (level 2) that the argument prolog copies it into; null where there is none.
 SYMTAB* map_sym_to_parm(const SYMTAB* sym);
 SYMTAB* map_parm_to_sym(const SYMTAB* parm);
-SYMTAB* object_name_if_known(const NODE* tree);
+SYMTAB* object_name_if_known(const NODE* tree); // the object that an lvalue lies in for certain, or null
 
 // ---- Substitution
 NODE* subst_sym_for_sym_in_tree(SYMTAB* from, SYMTAB* to, NODE* t);
 NODE* subst_sym_pairs_in_tree(NODE* t, const SYMPAIRLIST* pairs);
+// Copies of `replacement` for what is congruent to `lvalue`. One that is no lvalue replaces reads only.
 NODE* subst_tree_for_lvalue_in_tree(const NODE* replacement, const NODE* lvalue, NODE* t);
 NODE* expunge_IDENTITY_ops_from_tree(NODE* t);
 
@@ -88,28 +98,38 @@ NODE* copy_tree(const NODE* t, bool keep_scope = true);
 NODE* copy_dd_tree(const NODE* t, bool keep_scope = true);
 NODE* copy_node(const NODE* t, bool keep_scope = true); // operands stay shared
 NODE* copy_dd_node(const NODE* t, bool keep_scope);
-NODE* copy_tree_0(const NODE* t, FUNINFO* funinfo);     // across functions
+NODE* copy_tree_0(const NODE* t, FUNINFO* funinfo); // across functions
 NODE* copy_node_if_changed(NODE* node, NODE* left, NODE* right);
 LIST* copy_statements(const LIST* list, bool keep_scope = true);
 LIST* copy_shared_statements(const LIST* list);
 LIST* copy_dd_statements(const LIST* list, bool keep_scope = true);
 
-// ---- Erasing
+// What copying and erasing do to a node's points-to environment; null while nothing makes any.
+struct PTENV_HOOKS {
+    PTENV* (*copy)(const PTENV*) = nullptr;
+    void (*erase)(PTENV*) = nullptr;
+};
+extern PTENV_HOOKS ptenv_hooks;
+
+// ---- Erasing. A node erased twice is an internal error. LABELREFs are not discounted: their labels may be gone by
+// then.
 void erase_tree(NODE* t);
-void erase_node(NODE* t); // one node with what it owns, not its operands
+void erase_node(NODE* t);              // one node with what it owns, not its operands
 void erase_tree_list(LIST* list);      // trees and cells
 void erase_tree_list_only(LIST* list); // cells
 void erase_tree_list_to_entry(LIST* list, LIST* entry);
 
 // ---- Walking. `visit` sees every node, operands before the node that holds them.
-template <class F> void for_each_node(NODE* t, F&& visit) {
+template <class F>
+void for_each_node(NODE* t, F&& visit) {
     if (!t) return;
     for_each_node(t->left, visit);
     for_each_node(t->right, visit);
     visit(t);
 }
 // Replaces every node, operands first, by what `rewrite` makes of it.
-template <class F> NODE* rewrite_tree(NODE* t, F&& rewrite) {
+template <class F>
+NODE* rewrite_tree(NODE* t, F&& rewrite) {
     if (!t) return nullptr;
     t->left = rewrite_tree(t->left, rewrite);
     t->right = rewrite_tree(t->right, rewrite);
@@ -117,6 +137,6 @@ template <class F> NODE* rewrite_tree(NODE* t, F&& rewrite) {
 }
 
 // ---- Text
-std::string tree_to_infix(const NODE* t);      // C-like, parentheses by precedence
-std::string stmt2infix(const NODE* t);         // as a statement
+std::string tree_to_infix(const NODE* t);                  // C-like, parentheses by precedence
+std::string stmt2infix(const NODE* t);                     // as a statement
 void print_tree(FILE* out, const NODE* t, int indent = 0); // one line a node, operands indented

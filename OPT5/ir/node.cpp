@@ -1,0 +1,195 @@
+// NODE: construction, and the constants as the I-file layer reads and sets them.
+//
+// Every reader of a small integer out of u.lval asserts that the value fits 32 bits: a value that does not is a fault
+// of the pass that made it, and writing its low half would be a wrong program.
+
+#include "OPT5/ir/node.h"
+
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/pool.h"
+#include "OPT5/ir/type_ops.h"
+#include "UTIL/safemem.h"
+
+#include <cstdlib>
+#include <cstring>
+#include <mutex>
+#include <string>
+
+// ---- Memory
+void* NODE::operator new(std::size_t) { return record_pool<sizeof(NODE)>::take(); }
+void NODE::operator delete(void* p) { record_pool<sizeof(NODE)>::give(p); }
+
+NODE* clone_node(const NODE* t) { return new NODE(*t); }
+
+// The destructor has nothing to do and is left out, so that a pooled cell keeps the ILLOP that marks it.
+void free_node(NODE* t) { NODE::operator delete(t); }
+
+// ---- Construction
+namespace {
+
+// With one size for `char` and `short`, the normalized forms of both are the same, and a cast to a character pointer
+// has to be told from any other by its opcode for alias analysis.
+bool marks_char_access(const TYPE* type) {
+    if (!chars_alias_other_types || !type->is_pointer() || tp->schar_t->size != tp->short_t->size) return false;
+    const TYPE* pointee = type->type_pointed_to();
+    return pointee->is_schar() || pointee->is_uchar();
+}
+
+void note_call() {
+    if (currfuninfo) currfuninfo->no_calls = false;
+}
+
+} // namespace
+
+NODE* new_node(int op, TYPE* type) {
+    NODE* t = new NODE;
+    t->op = op;
+    t->type = t->orig_type = type;
+    switch (op) {
+    case UCALL: note_call(); break;
+    case SCONV:
+        if (type && type->is_enum()) t->type = normalized_underlying_type(type);
+        break;
+    case PCONV:
+        if (type && marks_char_access(type)) t->op = ISP2CHAR;
+        break;
+    }
+    return t;
+}
+
+NODE* maketree(int op, NODE* left, NODE* right, TYPE* type, LS* ls) {
+    if (op == SCONV || op == PCONV || op == ACONV) type = type->stqs();
+    NODE* t = new_node(op, type);
+    t->left = left;
+    t->right = right;
+    t->ls = ls;
+    return t;
+}
+
+NODE* mktree(int op, NODE* left, NODE* right, TYPE* type, SYMTAB* sym, INT65 lval) {
+    NODE* t = maketree(op, left, right, type);
+    if (sym)
+        t->u.sym = sym;
+    else
+        t->u.lval = lval;
+    return t;
+}
+
+// ---- What the writer asks
+I_SYMTAB* NODE::name_symbol() const { return u.sym; }
+int NODE::field_kind() const { return 1; }
+fkMDATA* NODE::field_mval() const { return mval; }
+TYPE* NODE::field_csu() const { return u.csu; }
+uint32_t NODE::icon_uvalue() const { return u.lval.fits_in<uint32_t>(); }
+int32_t NODE::icon_svalue() const { return u.lval.fits_in<int32_t>(); }
+const char* NODE::lcon_value() const { return int2text(u.lval, type, 10, 0); }
+const char* NODE::scon_value() const { return text; }
+uint32_t NODE::scon_length() const { return u.lval.fits_in<uint32_t>(); }
+// An internal label counts down from -1; in the file it is that number's 32-bit pattern.
+uint32_t NODE::label_id() const {
+    return u.lval.is_negative() ? static_cast<uint32_t>(u.lval.fits_in<int32_t>()) : u.lval.fits_in<uint32_t>();
+}
+int32_t NODE::vreg_id() const { return 0; }
+uint32_t NODE::skip_count() const { return u.lval.fits_in<uint32_t>(); }
+uint32_t NODE::case_count() const { return u.lval.fits_in<uint32_t>(); }
+uint32_t NODE::ddnode_id() const { return dd ? dd->id : 0; }
+uint32_t NODE::ddnode_locale() const { return 0; }
+uint8_t NODE::ddnode_flags() const { return 0; }
+uint32_t NODE::call_num_vargs() const { return u.lval.fits_in<uint32_t>(); }
+const char* NODE::icall_name() const { return u.name; }
+uint32_t NODE::eh_entry_id() const { return eh_entry; }
+uint32_t NODE::get_edge_profile_value() const { return edge_profile; }
+
+// The hexadecimal form holds every bit of the target's value, the decimal one need not. Infinities and NaN take the
+// words that the text conversion knows.
+const char* NODE::fcon_value() const {
+    if (text) return text;
+    char buffer[128];
+    if (f_is_nan(u.fval))
+        strcpy(buffer, "nan");
+    else if (f_is_inf(u.fval))
+        strcpy(buffer, u.fval->sign ? "-inf" : "inf");
+    else
+        f_ftoa(buffer, "%a", u.fval);
+    const_cast<NODE*>(this)->text = safestrdup(buffer);
+    return text;
+}
+
+// ---- What the reader sets
+void NODE::set_edge_profile_value(uint32_t count) { edge_profile = count; }
+
+void NODE::mk_name(I_SYMTAB* sym) {
+    u.sym = static_cast<SYMTAB*>(sym);
+    if (!u.sym) return;
+    orig_type = u.sym->orig_type ? u.sym->orig_type : u.sym->type;
+    if ((u.sym->cqual & CQ_MARKS_FUNCTION) && currfuninfo) currfuninfo->has_cqual10_name = true;
+}
+
+void NODE::mk_field(int kind, fkMDATA* member, TYPE* csu) {
+    if (kind != 1) abort_optimizer();
+    mval = member;
+    u.csu = csu;
+    if (member && member->is_bitfld && currfuninfo) currfuninfo->has_bitfield_access = true;
+    if (!type) return;
+    std::lock_guard<std::recursive_mutex> guard(mk_ptr_lock);
+    type = type->normalized_type();
+}
+
+// The file carries 32 bits, read by the sign of the node's type.
+void NODE::mk_icon(int64_t value) {
+    bool is_32_bits = value >= INT32_MIN && value <= UINT32_MAX;
+    if (!is_32_bits)
+        u.lval = INT65(value);
+    else if (type && type->is_signed())
+        u.lval = INT65(static_cast<int32_t>(value));
+    else
+        u.lval = INT65(static_cast<uint32_t>(value));
+    if (type && (type->is_int() || type->is_enum() || type->is_pointer())) u.lval = truncate_to_type(u.lval, type);
+}
+
+void NODE::mk_lcon(const char* digits) {
+    bool negative = *digits == '-';
+    if (negative || *digits == '+') ++digits;
+    INT65 value = static_cast<int64_t>(strtoull(digits, nullptr, 10));
+    value.sign = 0;
+    op = ICON;
+    u.lval = truncate_to_type(negative ? -value : value, type);
+}
+
+void NODE::mk_fcon(const char* number) {
+    u.fval = new simul_fval;
+    {
+        std::lock_guard<std::mutex> guard(atof_lock);
+        f_atof(number, u.fval);
+    }
+    truncate_fval_to_target(u.fval, type);
+}
+
+void NODE::mk_scon(const char* bytes, uint32_t length) {
+    text = static_cast<char*>(safemalloc(length + 1));
+    if (length) memcpy(text, bytes, length);
+    text[length] = 0;
+    u.lval = INT65(length);
+}
+
+void NODE::mk_label(uint32_t label) { u.lval = INT65(label); }
+void NODE::mk_vreg(int32_t) {}
+void NODE::mk_skip(uint32_t count) { u.lval = INT65(count); }
+void NODE::mk_switch(uint32_t cases) { u.lval = INT65(cases); }
+void NODE::mk_ddnode(uint32_t, uint32_t, uint8_t) {}
+
+void NODE::mk_call(uint32_t num_vargs, uint32_t entry) {
+    u.lval = INT65(num_vargs);
+    varargs = num_vargs != 0;
+    eh_entry = entry;
+    note_call();
+}
+
+void NODE::mk_ucall(uint32_t entry) {
+    eh_entry = entry;
+    note_call();
+}
+
+void NODE::mk_icall(const char* name) { u.name = safestrdup(name); }

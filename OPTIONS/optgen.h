@@ -13,6 +13,7 @@ namespace DIAG {
         DIAGNOSTIC* alloc() const override { return new name(*this); }                                                 \
     };
 #define ARGS(...) (const char* file, unsigned line, __VA_ARGS__)
+OPTGEN_CLASS(invalid_option, 6006, ARGS(const char* option), option)
 OPTGEN_CLASS(optgen_conflict_option, 24002, ARGS(const char* option, const char* other), option, other)
 OPTGEN_CLASS(optgen_conflict_override_option, 24003, ARGS(const char* option, const char* other), option, other)
 OPTGEN_CLASS(optgen_conflict_quiet_option, 24004, ARGS(const char* option, const char* other), option, other)

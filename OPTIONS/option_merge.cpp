@@ -33,16 +33,16 @@ void option_obj::do_merge_conflicts(int id, const option_obj& other, const char*
         switch (merge_conflicts(id, ours)) {
         case 1:
             if (debug)
-                DIAG::optgen_conflict_quiet_option(__FILE__, __LINE__, theirs_text.c_str(), ours_text.c_str()).report();
+                report(DIAG::optgen_conflict_quiet_option(__FILE__, __LINE__, theirs_text.c_str(), ours_text.c_str()));
             clearopt(ours);
             break;
         case 2:
-            DIAG::optgen_conflict_override_option(__FILE__, __LINE__, theirs_text.c_str(), ours_text.c_str()).report();
+            report(DIAG::optgen_conflict_override_option(__FILE__, __LINE__, theirs_text.c_str(), ours_text.c_str()));
             clearopt(ours);
             break;
         case 3:
-            DIAG::optgen_merge_conflict_option(__FILE__, __LINE__, theirs_text.c_str(), file, ours_text.c_str())
-                .report();
+            report(
+                DIAG::optgen_merge_conflict_option(__FILE__, __LINE__, theirs_text.c_str(), file, ours_text.c_str()));
             clearopt(ours);
             std::exit(1);
         }
@@ -86,14 +86,13 @@ void option_obj::merge_one(int id, const option_obj& other, const char* file) {
     case merge_policy_exact:
     case merge_policy_exact_notset:
         if (getopt(id) && !other.getopt(id))
-            DIAG::optgen_exact_set_in_previous_files(__FILE__, __LINE__, format_of_option(id).c_str(), file).report();
+            report(DIAG::optgen_exact_set_in_previous_files(__FILE__, __LINE__, format_of_option(id).c_str(), file));
         else if (!getopt(id) && other.getopt(id))
-            DIAG::optgen_exact_not_set_in_previous_files(__FILE__, __LINE__, other.format_of_option(id).c_str(), file)
-                .report();
+            report(DIAG::optgen_exact_not_set_in_previous_files(__FILE__, __LINE__, other.format_of_option(id).c_str(),
+                                                                file));
         else if (merge_policies[id] == merge_policy_exact && getopt(id) && args_text(*this, id) != args_text(other, id))
-            DIAG::optgen_exact_args_incompatible(__FILE__, __LINE__, with_arguments(other, id).c_str(), file,
-                                                 with_arguments(*this, id).c_str())
-                .report();
+            report(DIAG::optgen_exact_args_incompatible(__FILE__, __LINE__, with_arguments(other, id).c_str(), file,
+                                                        with_arguments(*this, id).c_str()));
         break;
     case merge_policy_and:    // the other object's value stays out
     case merge_policy_none:   // nothing

@@ -40,15 +40,15 @@ void option_obj::do_conflicts(int id) {
         const std::string ours = format_of_option(id), theirs = format_of_option(other);
         switch (conflicts(id, other)) {
         case 1:
-            if (debug) DIAG::optgen_conflict_quiet_option(__FILE__, __LINE__, ours.c_str(), theirs.c_str()).report();
+            if (debug) report(DIAG::optgen_conflict_quiet_option(__FILE__, __LINE__, ours.c_str(), theirs.c_str()));
             clearopt(other);
             break;
         case 2:
-            DIAG::optgen_conflict_override_option(__FILE__, __LINE__, ours.c_str(), theirs.c_str()).report();
+            report(DIAG::optgen_conflict_override_option(__FILE__, __LINE__, ours.c_str(), theirs.c_str()));
             clearopt(other);
             break;
         case 3:
-            DIAG::optgen_conflict_option(__FILE__, __LINE__, ours.c_str(), theirs.c_str()).report();
+            report(DIAG::optgen_conflict_option(__FILE__, __LINE__, ours.c_str(), theirs.c_str()));
             clearopt(other);
             std::exit(1);
         }
@@ -63,7 +63,7 @@ void option_obj::clear_conflicting(int id) {
 void option_obj::clearopt(int id) {
     if (!valid(id)) return;
     if (option_definitions[id].flags[2]) {
-        if (getopt(id)) DIAG::optgen_clear_persistent(__FILE__, __LINE__, format_of_option(id).c_str()).report();
+        if (getopt(id)) report(DIAG::optgen_clear_persistent(__FILE__, __LINE__, format_of_option(id).c_str()));
         return;
     }
     state[id] = 0;
@@ -101,7 +101,7 @@ void option_obj::setarg(int id, long value) {
     case PK_ENUM:
     case PK_NUMBER_LIST:
     case PK_UNSIGNED_LIST: store(id, {std::string(), value}); break;
-    default: DIAG::optgen_unhandled_clause_in_setarg(__FILE__, __LINE__, id).report();
+    default: report(DIAG::optgen_unhandled_clause_in_setarg(__FILE__, __LINE__, id));
     }
 }
 
@@ -111,7 +111,7 @@ void option_obj::setarg(int id, const char* value) {
     switch (parm_type[id]) {
     case PK_STRING:
     case PK_STRING_LIST: store(id, {value, 0}); break;
-    default: DIAG::optgen_unhandled_clause_in_setarg(__FILE__, __LINE__, id).report();
+    default: report(DIAG::optgen_unhandled_clause_in_setarg(__FILE__, __LINE__, id));
     }
 }
 
@@ -133,7 +133,7 @@ void option_obj::addfileopt(const char* tool, const char* option) {
     if (tool_cmd_map.count(tool))
         tn_fileopt_map[tool].push_back(option);
     else
-        DIAG::optgen_missing_fileopt(__FILE__, __LINE__, tool).report();
+        report(DIAG::optgen_missing_fileopt(__FILE__, __LINE__, tool));
 }
 
 void option_obj::add_to_history(int id, const std::string& text) { history.push_back({id, text}); }

@@ -153,8 +153,9 @@ public:
     static int get_radix(const char* text); // 16 behind "0x", 2 behind "0b", 8 behind "0", else 10
     static bool strtol_by_radix(const char* text, long* value);
     static bool strtoul_by_radix(const char* text, unsigned long* value);
-    // Warns when an option word [written, written + strlen(spelling)) differs from its spelling.
-    static void deprecated_case(const char* written, const char* spelling);
+    // Warns when the option word that begins at `written` differs from its spelling.
+    void deprecated_case(const char* written, const char* spelling);
+    std::string origin;       // where the words stand, for messages; empty for the command line
     bool help_allowed = true; // `--help` and its kin print and end the run; elsewhere they are no options
 
     // ---- Setting
@@ -218,6 +219,8 @@ public:
     bool no_conflicts = false; // conflicts are not checked while set
 
 private:
+    void report(DIAGNOSTIC&& message) const;
+    [[noreturn]] void report_and_exit(DIAGNOSTIC&& message) const;
     static bool valid(int id) { return id >= 0 && id < OPTION_COUNT; }
     const char* parse_one(const char* word);
     const char* take_option(const char* word, int id, int form);

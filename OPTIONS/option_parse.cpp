@@ -74,12 +74,17 @@ ARG_TEXT text_of_type(option_obj::parse_option_type type) {
     return ARG_UNKNOWN;
 }
 
-[[noreturn]] void report_and_exit(DIAGNOSTIC&& message) {
-    message.report();
-    std::exit(1);
+} // namespace
+
+void option_obj::report(DIAGNOSTIC&& message) const {
+    const DIAG_SRCINFO_DATA where(origin.c_str(), 0, 0);
+    message.set_src(origin.empty() ? nullptr : &where)->report();
 }
 
-} // namespace
+void option_obj::report_and_exit(DIAGNOSTIC&& message) const {
+    report(std::move(message));
+    std::exit(1);
+}
 
 bool option_obj::process_option(const char* word, const char** rest) {
     while (*word) {
@@ -125,18 +130,14 @@ const char* option_obj::parse_one(const char* word) {
 void option_obj::deprecated_case(const char* written, const char* spelling) {
     const std::string as_written(written, std::strlen(spelling));
     if (as_written == spelling) return;
-    DIAG::optgen_case_insensitivity_deprecated(__FILE__, __LINE__, ("-" + as_written).c_str(),
-                                               (std::string("-") + spelling).c_str())
-        .report();
+    report(DIAG::optgen_case_insensitivity_deprecated(__FILE__, __LINE__, ("-" + as_written).c_str(),
+                                                      (std::string("-") + spelling).c_str()));
 }
 
 void option_obj::parse_arg(int id, const char* text, const char* option_name, parse_option_type type,
                            const arg_range* range) {
     const ARG_TEXT kind = text_of_type(type);
-    if (kind == ARG_UNKNOWN) {
-        DIAG::optgen_option_handler_corruption(__FILE__, __LINE__).report();
-        std::exit(1);
-    }
+    if (kind == ARG_UNKNOWN) report_and_exit(DIAG::optgen_option_handler_corruption(__FILE__, __LINE__));
     if (*text == '=') ++text;
     const bool may_follow = type < PT_ATTACHED_NUM;
     if (!*text && may_follow) text = next_arg ? next_arg() : nullptr;

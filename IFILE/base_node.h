@@ -37,7 +37,8 @@ public:
     virtual uint32_t eh_entry_id() const = 0;
     virtual uint32_t get_edge_profile_value() const = 0;
 
-    // ---- What the reader sets, once, on a node fresh from `IF_CLIENT::new_node`. Texts are borrowed and must be copied.
+    // ---- What the reader sets, once, on a node fresh from `IF_CLIENT::new_node`. Texts are borrowed and must be
+    // copied.
     virtual void set_edge_profile_value(uint32_t count) = 0;
     virtual void mk_name(I_SYMTAB* sym) = 0; // null for "no symbol"
     virtual void mk_field(int kind, fkMDATA* member, TYPE* csu) = 0;

@@ -1,7 +1,8 @@
-// IF_CLIENT: the one seam between the I-file layer and whoever uses it. The reader calls these operations as records arrive.
+// IF_CLIENT: the one seam between the I-file layer and whoever uses it. The reader calls these operations as records
+// arrive.
 //
-// Trees and symbols passed in belong to the client from then on, except where told. Texts and arrays are borrowed for the
-// time of the call. Positions live as long as the I_FILE.
+// Trees and symbols passed in belong to the client from then on, except where told. Texts and arrays are borrowed for
+// the time of the call. Positions live as long as the I_FILE.
 #pragma once
 
 #include "IFILE/base_node.h"
@@ -70,9 +71,11 @@ public:
     virtual void cl_preprocess_statics() = 0;
     virtual void cl_func_info(uint8_t info) = 0;
     virtual bool cl_func_eht(EHT_ENTRY* entries, uint32_t count) = 0; // true: the layer frees the array
-    virtual void cl_loop_def(uint32_t id, uint32_t outer, uint32_t min, uint32_t max, uint32_t factor, uint16_t flags) = 0;
+    virtual void cl_loop_def(uint32_t id, uint32_t outer, uint32_t min, uint32_t max, uint32_t factor,
+                             uint16_t flags) = 0;
     virtual void cl_loop_header(uint32_t id, I_SYMTAB* lcv, uint8_t flags) = 0;
-    virtual void cl_dd_vector(uint32_t id, uint8_t flags, uint32_t count, const uint16_t* elements) = 0; // direction low
+    virtual void cl_dd_vector(uint32_t id, uint8_t flags, uint32_t count,
+                              const uint16_t* elements) = 0; // direction low
     virtual void cl_dd_edge(uint32_t from, uint32_t to, uint32_t vector) = 0;
     virtual void cl_mbank(uint32_t a, uint32_t b, uint32_t c, uint32_t d, uint32_t e) = 0;
     virtual void cl_ldspec_induct(uint32_t id, uint32_t word, int32_t step, TYPE* type, I_SYMTAB* sym) = 0;

@@ -62,6 +62,8 @@ constexpr int IF_CPU_ID = 600;
 constexpr int IF_MAX_OPCODE = 163;
 // Trees nested deeper are refused: the walkers recurse, and this is what their stack is laid out for.
 constexpr int IF_MAX_TREE_DEPTH = 200000;
+// The same for derived types, and for structures within structures.
+constexpr uint32_t IF_MAX_TYPE_DEPTH = 2000;
 
 extern int icode_cpu_id; // target code of the input, written back unchanged
 
@@ -89,6 +91,7 @@ int if_float_relop(int op);
 struct TYPE_INFO {
     TYPE* type = nullptr;
     uint32_t pending = 0; // list records still expected
+    uint32_t depth = 0;   // how deep the type is nested; a class, struct or union counts 0
 };
 
 class I_FILE {
@@ -102,7 +105,7 @@ public:
     int64_t off_options = 0, off_inits = 0, off_types = 0, off_files = 0, off_globals = 0;
     std::vector<OPTION_SET> option_sets; // writer
     TYPE_PKG* type_pkg = nullptr;
-    std::map<int, TYPE_INFO> typeref_map; // reader
+    std::map<uint64_t, TYPE_INFO> typeref_map; // reader: the types whose numbers are too scattered for a plain index
     int64_t extra_word = 0;
     int64_t level = 0; // 0 outside functions, 1 after begin function, 2 after end of arguments, plus 1 per open block
     std::vector<I_SYMTAB*> locals;
@@ -114,10 +117,12 @@ public:
 
     // ---- Opening and closing
     // Takes over `stream` in either case. Null if the header is not acceptable; `*why`, if given, tells what was wrong.
+    // `if_open` also reads the option sets and throws `if_error` if they are malformed.
     static I_FILE* if_open(FILE* stream, IF_CLIENT* client, std::string* why = nullptr);
     static I_FILE* if_open_basic(FILE* stream, IF_CLIENT* client, std::string* why = nullptr);
     static I_FILE* if_create(FILE* stream, TYPE_PKG* pkg, const char* source_name);
-    // Writes the trailing sections unless `discard`, frees the object, closes the stream. 1 if the stream failed, else 0.
+    // Writes the trailing sections unless `discard`, frees the object, closes the stream. 1 if the stream failed, else
+    // 0.
     static int if_close(I_FILE* file, bool keep_all_types, bool discard);
 
     // ---- Reader
@@ -156,7 +161,7 @@ public:
     void if_write_func_info(uint8_t info);
     void if_write_expr(const BASE_NODE* tree, PSN* psn); // with a null tree the header alone
     void if_write_expr_node(const BASE_NODE* tree);
-    void if_write_init(I_SYMTAB* sym); // opens the initializer section on first use
+    void if_write_init(I_SYMTAB* sym);   // opens the initializer section on first use
     void if_write_symbol(I_SYMTAB* sym); // with its pragmas
     void if_write_pragma(const PRAGMA* pragma);
     void if_write_loop(uint32_t id, uint32_t outer, uint32_t min, uint32_t max, uint32_t factor, uint16_t flags);
@@ -169,20 +174,273 @@ public:
     void if_write_ldspec_region(uint32_t id, uint32_t label);
     void if_write_func_eht(const EHT_ENTRY* entries, uint32_t count);
     void if_write_type(TYPE* type);
-    void if_reference_type(TYPE* type); // marks it, and what it was merged into, as needed by the output; null does nothing
+    void
+    if_reference_type(TYPE* type); // marks it, and what it was merged into, as needed by the output; null does nothing
     void if_write_all_types(bool keep_named);
 
     // ---- Both
     int64_t if_tell() const;
     void if_seek(int64_t offset);
     void if_flush();
-    void if_enter_global(I_SYMTAB* sym); // level 0 and the next index
-    void if_enter_local(I_SYMTAB* sym);  // the current level and the next index
+    void if_enter_global(I_SYMTAB* sym);          // level 0 and the next index
+    void if_enter_local(I_SYMTAB* sym);           // the current level and the next index
     uint32_t i_enter_file_name(const char* name); // the number, from 1
     uint32_t i_get_file_id(const char* name) const;
     const char* i_get_file_name(uint32_t n) const; // null for a number that is none
 
 private:
+    // The element list of a type that is being read: between its header and its trailer.
+    struct OPEN_LIST {
+        uint64_t number = 0; // of the owning type
+        int list = -1;       // -1: none is open
+        TYPE* type = nullptr;
+        fkMDATA* members = nullptr;
+        fkPARAM* params = nullptr;
+        fkETOR* etors = nullptr;
+        std::vector<uint32_t> member_numbers;
+        void* tail = nullptr; // last element of the chain in work
+        ~OPEN_LIST();
+    };
+    // The members of one struct by the numbers that the file gave them.
+    struct MEMBER_TABLE {
+        std::vector<uint32_t> numbers; // empty: 1, 2, 3 ... in list order
+        std::vector<fkMDATA*> members; // filled on first use
+        bool filled = false;
+    };
+    // A node whose operands are still being read.
+    struct OPEN_NODE {
+        BASE_NODE* node;
+        BASE_NODE* left;
+        int operands;
+    };
+    // A nested type or friend class may be named before its own record.
+    struct FORWARD_REF {
+        TYPE* owner;
+        int list;
+        size_t item;
+        uint64_t number;
+        int64_t at;
+    };
+    struct WRITE_BUFFER {
+        uint8_t* bytes = nullptr;
+        size_t used = 0, size = 0;
+        void grow(size_t room);
+        ~WRITE_BUFFER();
+    };
+    class SECTION;
+
     I_FILE() = default;
-#include "IFILE/ifile_private.h"
+
+    // ---- Reader state. The whole file is in memory; `cursor` never passes `limit`, the end of the record in work.
+    std::unique_ptr<uint8_t[]> image;
+    const uint8_t* image_end = nullptr;
+    const uint8_t* cursor = nullptr;
+    const uint8_t* limit = nullptr;
+    const uint8_t* record = nullptr; // its kind byte
+    const uint8_t* body = nullptr;   // first byte behind the header
+    std::vector<TYPE_INFO> dense_types;
+    std::vector<uint64_t> type_order; // numbers of named types in order of reading
+    std::unordered_map<uint64_t, MEMBER_TABLE> member_tables;
+    std::unique_ptr<OPEN_LIST> open_list;
+    std::vector<FORWARD_REF> forward_refs;
+    size_t waiting_types = 0; // types that still expect lists
+    std::vector<OPEN_NODE> open_nodes;
+    std::vector<bool> defined; // globals whose function or initializer has been read
+    std::deque<PSN> psns;
+    uint32_t eht_count = 0;    // entries of the function's exception table
+    uint32_t max_eh_entry = 0; // highest entry that a call of the function names
+    bool reading_unit = false;
+
+    // ---- Writer state
+    WRITE_BUFFER buffer;       // bytes that are not in the stream yet
+    size_t payload = 0;        // where the payload of the record in work starts in `buffer`
+    int64_t buffer_offset = 0; // file offset of the buffer's first byte
+    bool stream_failed = false;
+    bool inits_open = false;
+    std::unordered_map<std::string_view, uint32_t> file_ids;
+    uint32_t last_file_id = 0; // of the name entered last: positions come in runs of one file
+    bool types_written = false;
+    std::vector<const BASE_NODE*> waiting_nodes; // right subtrees of the tree in work
+    std::vector<TYPE*> csu_queue;                // classes whose record is written and whose lists are not
+
+    // ---- Both
+    std::deque<std::string> file_table; // number 1 first
+
+    // ---- Primitives
+    [[noreturn]] void bad_input(const char* format, ...) const __attribute__((format(printf, 2, 3)));
+    [[noreturn]] void short_payload() const;
+    template <class WORK>
+    void guard_types(WORK work);
+    uint8_t i_read_u8();
+    int8_t i_read_s8();
+    bool i_read_bool();
+    uint16_t i_read_u16();
+    int16_t i_read_s16();
+    uint32_t i_read_u32();
+    int32_t i_read_s32();
+    uint64_t i_read_uint();
+    uint64_t i_read_long_uint();
+    uint32_t i_read_uint32(const char* what); // a uint that must fit 32 bits
+    int64_t i_read_sint();
+    const char* i_read_string(); // lives as long as the reader
+    const uint8_t* i_read_raw(uint64_t size);
+    PSN* i_read_psn();
+    int i_read_header(); // a record's frame; its payload is next
+    void end_record();   // the payload must be used up
+    uint64_t rest() const { return static_cast<uint64_t>(limit - cursor); }
+    bool load_image();
+    bool read_file_header(std::string* why);
+    bool check_sections(std::string* why) const;
+    static I_FILE* open_reader(FILE* stream, IF_CLIENT* client, std::string* why);
+
+    void room(size_t bytes);
+    void begin_payload();
+    void i_flush(int kind); // closes the record in work
+    void drain();           // hands the buffer to the stream
+    void i_write_i8(int v);
+    void i_write_bool(bool v);
+    void i_write_i16(int v);
+    void i_write_i32(uint32_t v);
+    void i_write_uint(uint64_t v);
+    void i_write_sint(int64_t v);
+    void i_write_string(const char* text, size_t length); // length 0: as a terminated string
+    void i_write_psn(const PSN* psn);
+    void i_write_typeref(TYPE* type);
+    void i_write_raw(const uint8_t* bytes, size_t size);
+    void i_write_eof();
+    void enter_position(const PSN* psn);
+    void write_file_header();
+    void finish_output(bool keep_all_types);
+
+    // ---- Records of the body
+    void read_record(int kind);
+    void enter_function();
+    void need_function(const char* what) const;
+    I_SYMTAB* find_symbol(int32_t symbol_level, uint64_t index, const char* what) const;
+    I_SYMTAB* read_symbol_ref(const char* what);
+    I_SYMTAB* if_read_sym(int* pragma_count);
+    void if_read_pragma(I_SYMTAB* sym);
+    void if_read_begin_func();
+    void if_read_end_func();
+    void if_read_begin_block();
+    void if_read_end_block();
+    void if_read_end_args();
+    void if_read_end_locals();
+    void if_read_label();
+    void if_read_assembly();
+    void if_read_comment();
+    void if_read_source();
+    void if_read_func_info();
+    void if_read_expr_header();
+    void if_read_ir_begin();
+    void if_read_ir();
+    void if_read_ir_end();
+    void if_read_init();
+    void if_read_loop();
+    void if_read_inloop();
+    void if_read_dep_vector();
+    void if_read_dep_edge();
+    void if_read_mbank();
+    void if_read_ldspec();
+    void if_read_eht();
+    void if_read_eht_entry(EHT_ENTRY* entry, uint32_t table_size);
+    void check_eht(const EHT_ENTRY* entries, uint32_t count) const;
+
+    // ---- Nodes
+    BASE_NODE* read_node();
+    void read_node_payload(BASE_NODE* node);
+    void if_read_expr_name(BASE_NODE* node);
+    void if_read_expr_field(BASE_NODE* node);
+    void if_read_expr_icon(BASE_NODE* node);
+    void if_read_expr_lcon(BASE_NODE* node);
+    void if_read_expr_fcon(BASE_NODE* node);
+    void if_read_expr_scon(BASE_NODE* node);
+    void if_read_expr_label(BASE_NODE* node);
+    void if_read_expr_vreg(BASE_NODE* node);
+    void if_read_expr_skip(BASE_NODE* node);
+    void if_read_expr_switch(BASE_NODE* node);
+    void if_read_expr_ddnode(BASE_NODE* node);
+    void if_read_expr_icall(BASE_NODE* node);
+    void if_read_expr_call(BASE_NODE* node);
+    void if_read_expr_ucall(BASE_NODE* node);
+    void if_read_expr_pval(BASE_NODE* node);
+    void write_node(const BASE_NODE* node);
+    void begin_ldspec(uint32_t id, int subkind);
+    void end_ldspec(TYPE* type, I_SYMTAB* sym);
+    void if_write_eht_hdr(uint32_t count);
+    void if_write_eht_entry(const EHT_ENTRY& entry);
+    void if_write_eht_catch_entry(const I_CATCH_ENTRY& clause);
+    void write_name(const BASE_NODE* node);
+
+    // ---- Types, reading
+    void if_read_type();
+    void read_type(uint64_t n, int tag);
+    void read_element(uint64_t n, int tag);
+    void if_read_void_type(uint64_t n);
+    void if_read_integral_type(uint64_t n, int tag);
+    void if_read_float_type(uint64_t n, int tag);
+    void if_read_fixedpoint_type(uint64_t n);
+    void if_read_complex_type(uint64_t n);
+    void if_read_typedef(uint64_t n);
+    void if_read_addr_type(uint64_t n);
+    void if_read_ref_type(uint64_t n);
+    void if_read_qual_type(uint64_t n);
+    void if_read_array_type(uint64_t n);
+    void if_read_ptm_type(uint64_t n);
+    void if_read_func_type(uint64_t n);
+    void if_read_enum_type(uint64_t n);
+    void if_read_csu(uint64_t n, bool long_form);
+    bool if_read_type_is_cpp(const char* name);
+    void if_read_list_header(uint64_t n);
+    void if_read_list_trailer(uint64_t n);
+    void if_read_param_elem();
+    void if_read_etor_elem();
+    void if_read_mdata_elem();
+    void if_read_bclass_elem();
+    void if_read_adecl_elem();
+    void if_read_ffriend_elem();
+    void if_read_late_elem(int list);
+    void if_read_sdata_elem();
+    void if_read_mfunc_elem();
+    void tp_make_list(uint64_t n, int list);
+    void tp_end_list(uint64_t n, int list);
+    void tp_make_csu(uint64_t n, TYPE* type, uint32_t lists);
+    void enter_type(uint64_t n, TYPE* type, uint32_t pending = 0);
+    TYPE_INFO* find_type_info(uint64_t n);
+    TYPE* read_typeref();                 // null for 0; notes the nesting
+    TYPE* need_typeref(const char* what); // 0 is an error
+    TYPE* typeref_or_void();
+    uint64_t read_bits(uint64_t highest, const char* what);
+    uint32_t read_align();
+    void resolve_forward_refs();
+    void check_containment();
+    void merge_read_types();
+    uint32_t nesting = 0; // of the types that the record in work has named
+
+    // ---- Types, writing
+    void write_type_record(TYPE* type);
+    void write_waiting_lists();
+    void write_all_csu_types();
+    void write_type_tree();
+    void begin_type(const TYPE* type, int tag);
+    void write_integral_type(TYPE* type);
+    void write_float_type(TYPE* type);
+    void write_fixedpoint_type(TYPE* type);
+    void write_typedef(TYPE* type);
+    void write_addr_type(TYPE* type, int tag, TYPE* target);
+    void write_qual_type(TYPE* type);
+    void write_array_type(TYPE* type);
+    void write_ptm_type(TYPE* type);
+    void write_func_type(TYPE* type);
+    void write_enum_type(TYPE* type);
+    void write_complex_type(TYPE* type);
+    void write_csu_type(TYPE* type);
+    void write_csu_type_lists(TYPE* type);
+    void write_list_frame(const TYPE* type, int tag, int list);
+    void write_param(const TYPE* owner, const fkPARAM& param);
+    template <class ELEMENT, class TYPE_OF, class FIELDS>
+    void write_csu_list(const TYPE* type, int list, int tag, const CSU_LIST<ELEMENT>& elements, TYPE_OF type_of,
+                        FIELDS fields);
+    void write_listof_etors(const TYPE* type);
+    void write_listof_mdata(const TYPE* type);
 };

@@ -1,1 +1,0 @@
-// The private section of I_FILE; included inside the class and nowhere else.

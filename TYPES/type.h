@@ -2,8 +2,8 @@
 //
 // Sizes, alignments and member offsets are in bits; a "byte" of `size_in_bytes` is the target's 16-bit unit. A type is
 // built by a maker of TYPE_PKG, which registers it, so that two structurally equal types of one base are one object and
-// types are compared by pointer where that is enough. TYPE objects are never freed during a run. A type is immutable once
-// registered, but for the caches `normalized` and `ptr_to`, the output marks and the equivalence link.
+// types are compared by pointer where that is enough. TYPE objects are never freed during a run. A type is immutable
+// once registered, but for the caches `normalized` and `ptr_to`, the output marks and the equivalence link.
 #pragma once
 
 #include "UTIL/psn.h"
@@ -43,6 +43,15 @@ private:
 // Ends the work of the type package by throwing `tp_failure`.
 [[noreturn]] void tp_die(const char* text);
 
+// Zeroed memory of the type package, counted for `print_stats`. Dies with "Out of memory: tp_alloc()".
+void* tp_alloc(std::size_t size);
+void tp_free(void* p, std::size_t size);
+
+// Gives the records of the package their memory from `tp_alloc`.
+#define TP_ALLOCATED                                                                                                   \
+    static void* operator new(std::size_t size) { return tp_alloc(size); }                                             \
+    static void operator delete(void* p, std::size_t size) { tp_free(p, size); }
+
 enum QUAL_BITS : unsigned {
     QUAL_CONST = 1,
     QUAL_VOLATILE = 2,
@@ -56,6 +65,7 @@ enum QUAL_BITS : unsigned {
 
 // One data member of a class, struct or union. Owned by its type.
 struct fkMDATA {
+    TP_ALLOCATED
     uint32_t ordinal = 0; // from 1, in list order, set by `register_type`
     TYPE* type = nullptr;
     std::string name;
@@ -70,11 +80,12 @@ struct fkMDATA {
     PSN* psn = nullptr;
     fkMDATA* next = nullptr;
 
-    fkMDATA(const std::string& name, TYPE* type, uint32_t access, int32_t offset, uint32_t width, bool flag1, bool is_bitfld,
-            bool flag3, bool flag4);
+    fkMDATA(const std::string& name, TYPE* type, uint32_t access, int32_t offset, uint32_t width, bool flag1,
+            bool is_bitfld, bool flag3, bool flag4);
 };
 
 struct fkPARAM {
+    TP_ALLOCATED
     TYPE* type = nullptr;
     bool flag = false; // the I-file's flag and word, passed through
     uint64_t word = 0;
@@ -83,6 +94,7 @@ struct fkPARAM {
 };
 
 struct fkETOR {
+    TP_ALLOCATED
     int64_t value = 0; // as the underlying type's sign dictates
     std::string name;
     PSN* psn = nullptr;
@@ -117,7 +129,8 @@ struct fkMFUNC {
     bool flags[4];
 };
 // A list that is absent differs from one that is there and empty: the I-file frames only the latter.
-template <class T> struct CSU_LIST {
+template <class T>
+struct CSU_LIST {
     bool present = false;
     std::vector<T> items;
 };
@@ -134,6 +147,7 @@ struct CSU_EXTRAS {
 
 class TYPE {
 public:
+    TP_ALLOCATED
     enum KIND {
         tpk_void,
         tpk_int,
@@ -213,15 +227,31 @@ public:
     // are neither signed nor unsigned.
     bool is_signed() const;
     bool is_unsigned() const;
-    bool is_bool() const; // of kind `bool`, or marked boolean
+    bool is_bool() const;       // of kind `bool`, or marked boolean
     bool is_plain_char() const; // `char` written without `signed` or `unsigned`
     bool is_ikind(IKIND k) const { return real->kind == tpk_int && real->ikind_m == k; }
     bool is_fkind(FKIND k) const { return real->kind == tpk_float && real->fkind_m == k; }
     bool is_schar() const { return is_ikind(ik_schar); }
     bool is_uchar() const { return is_ikind(ik_uchar); }
     bool is_wchar() const { return is_ikind(ik_wchar); }
+    // A complex type by its part.
+    bool is_complex_of(IKIND k) const { return is_complex() && real->target_m->is_ikind(k); }
+    bool is_complex_of(FKIND k) const { return is_complex() && real->target_m->is_fkind(k); }
+    bool is_cchar() const { return is_complex_of(ik_schar); }
+    bool is_cuchar() const { return is_complex_of(ik_uchar); }
+    bool is_cshort() const { return is_complex_of(ik_short); }
+    bool is_cushort() const { return is_complex_of(ik_ushort); }
+    bool is_cint() const { return is_complex_of(ik_int); }
+    bool is_cuint() const { return is_complex_of(ik_uint); }
+    bool is_clong() const { return is_complex_of(ik_long); }
+    bool is_culong() const { return is_complex_of(ik_ulong); }
+    bool is_cllong() const { return is_complex_of(ik_llong); }
+    bool is_cullong() const { return is_complex_of(ik_ullong); }
+    bool is_cfloat() const { return is_complex_of(fk_float); }
+    bool is_cdouble() const { return is_complex_of(fk_double); }
+    bool is_cldouble() const { return is_complex_of(fk_ldouble); }
     bool is_complete() const;
-    bool is_lowered() const;
+    bool is_lowered() const; // of a typedef, class, struct or union, seen through qualifiers
     bool is_struct_vector() const { return is_csu() && real->is_struct_vector_m; }
     bool is_bool_vector() const;
     bool is_vpred() const;
@@ -255,22 +285,25 @@ public:
     fkETOR* etors() const;
     fkMDATA* mdata() const; // first data member, null if there is none
     bool has_mdata_list() const { return real->mdata_set_m; }
-    uint32_t csu_word() const; // the class record's integer field
+    uint32_t csu_word() const;                                // the class record's integer field
     CSU_EXTRAS* csu_extras() const { return real->extras_m; } // null without
     unsigned own_qual_bits() const { return kind == tpk_qual ? qual_m : 0; }
+    // The one type that this node is built on (pointee, referent, qualified, named, element, part, underlying or return
+    // type), whatever the kind; null where there is none.
+    TYPE* component() const { return target_m; }
 
-    // Qualifier bits of the outer spine of qualifier and typedef nodes; with `through_arrays` those of array elements too.
-    // A type is volatile for every pass when `qual_kind(true) & QUAL_VOLATILE`.
-    unsigned qual_kind(bool through_arrays) const;
+    // Qualifier bits of the outer spine of qualifier and typedef nodes; with `through_arrays` those of array elements
+    // too. A type is volatile for every pass when `qual_kind(true) & QUAL_VOLATILE`.
+    unsigned qual_kind(bool through_arrays) const { return through_arrays ? deep_qual_m : spine_qual_m; }
     bool is_volatile() const { return qual_kind(true) & QUAL_VOLATILE; }
     bool is_const() const { return qual_kind(true) & QUAL_CONST; }
 
-    TYPE* stqs() const; // strips qualifier nodes at the outside
-    TYPE* stds() const; // strips typedef nodes at the outside
-    TYPE* getr(KIND k) const; // the real type, which must be of kind `k`
-    TYPE* getd(KIND k) const; // typedefs stripped only
-    TYPE* get_csu() const;    // this type if it is a class, struct or union node, else null
-    TYPE* getr_csu() const;   // the real class, struct or union; dies if there is none
+    TYPE* stqs() const;              // strips qualifier nodes at the outside
+    TYPE* stds() const;              // strips typedef nodes at the outside, down to the first node that is none
+    TYPE* getr(KIND k) const;        // the real type, which must be of kind `k`
+    TYPE* getd(KIND k) const;        // typedefs stripped only
+    TYPE* get_csu() const;           // this type if it is a class, struct or union node, else null
+    TYPE* getr_csu() const;          // the real class, struct or union; dies if there is none
     const std::string& name() const; // of a named type; empty for the others
 
     uint64_t size_in_bytes() const { return size >> 4; } // 16-bit units
@@ -283,7 +316,8 @@ public:
     // Kind number for tables: an integer's IKIND, 12 plus the FKIND of a float, fixed numbers 15 to 26 for the rest.
     int ekind() const;
 
-    // Links this type to `other`, which it equals across translation units. Refuses (returns false) where that is not sound.
+    // Links this type to `other`, which it equals across translation units. Refuses (returns false) where that is not
+    // sound.
     bool set_equiv(TYPE* other);
 
     void print(FILE* out) const;
@@ -297,8 +331,9 @@ public:
 
 private:
     friend class TYPE_PKG;
-    friend class TYPE_BUILDER;
     explicit TYPE(KIND k) : kind(k), real(this) {}
+    void take_component(TYPE* t); // sets `target_m` and what follows from it: `real` and the qualifier bits
+    uint64_t shape_hash() const;
     ~TYPE();
 
     IKIND ikind_m = ik_int;
@@ -328,6 +363,11 @@ private:
     uint32_t csu_word_m = 0;
     bool old_format_m = false; // read from a file of a version older than -80
     CSU_EXTRAS* extras_m = nullptr;
+    // Qualifier bits of `qual_kind`, known from the component when the node is made: a chain may be long.
+    unsigned spine_qual_m = 0, deep_qual_m = 0;
+    // Equal for types that are exact_types, so far as both were closed when they were first used; only looks types up.
+    uint64_t shape_m = 0;
+    std::list<TYPE*>::iterator place_m; // where `base_type(this)->based` holds this type, once registered
 };
 
 enum TP_ERROR_CODE { TP_NO_ERROR, TP_SIZE_NOT_SUPPORTED };
@@ -335,8 +375,8 @@ const char* error_code_name(TP_ERROR_CODE code);
 
 class TYPE_PKG {
 public:
-    TYPE *bool_t, *schar_t, *uchar_t, *wchar_t_, *short_t, *ushort_t, *int_t, *uint_t, *long_t, *ulong_t, *llong_t, *ullong_t,
-        *float_t, *double_t, *ldouble_t, *void_t, *void_ptr_t;
+    TYPE *bool_t, *schar_t, *uchar_t, *wchar_t_, *short_t, *ushort_t, *int_t, *uint_t, *long_t, *ulong_t, *llong_t,
+        *ullong_t, *float_t, *double_t, *ldouble_t, *void_t, *void_ptr_t;
     uint32_t current_tu = 0;
     uint32_t next_uid = 1;
 
@@ -346,6 +386,11 @@ public:
     static bool seen_enum_type, seen_small_enums;
     static int flat_memory_model, byte_mode, large_code_model, cpu_version, abi, wchar_t_size_in_bits;
     static unsigned tot_types, tot_structs, tot_enums, tot_funcs, tot_ptrs;
+
+    TYPE_PKG() = default;
+    ~TYPE_PKG(); // the last package that goes frees all types
+    TYPE_PKG(const TYPE_PKG&) = delete;
+    TYPE_PKG& operator=(const TYPE_PKG&) = delete;
 
     // Builds the root, `void_t`, `void_ptr_t` and the basic types. `abi` and `byte_mode` must be set before.
     static void init_type_pkg(TYPE_PKG* pkg);
@@ -381,30 +426,37 @@ public:
     TYPE* mk_unsigned(TYPE* t);
     TYPE* mk_bool_vector(uint32_t lanes);
     TYPE* mk_vpred();
-    TYPE* mk_struct_vector(TYPE* elem, uint32_t n);
-    TYPE* mk_typedef(const std::string& name, bool cpp, TYPE* named, uint64_t size, uint32_t align, bool lowered, PSN* psn = nullptr);
+    TYPE* mk_struct_vector(TYPE* elem, uint32_t n); // n members "__x0", "__x1" and so on
+    TYPE* mk_typedef(const std::string& name, bool cpp, TYPE* named, uint64_t size, uint32_t align, bool lowered,
+                     PSN* psn = nullptr);
 
     // The following are built in two steps: made open, given their lists with the setters below, then closed with
     // `type_frozen`. An empty name or one that starts "$$fake" makes a tagless type.
     TYPE* mk_func(TYPE* ret, bool cpp, bool vararg, bool proto, TYPE::CC_KIND cc, uint64_t size, uint32_t align);
-    TYPE* mk_enum(const std::string& name, TYPE* underlying, uint64_t size, uint32_t align, bool cpp, PSN* psn = nullptr);
-    TYPE* mk_csu(TYPE::KIND kind, const std::string& name, bool complete, bool lowered, uint64_t size, uint32_t align, bool cpp,
-                 bool is_struct_vector = false, uint32_t word = 0, PSN* psn = nullptr);
+    TYPE* mk_enum(const std::string& name, TYPE* underlying, uint64_t size, uint32_t align, bool cpp,
+                  PSN* psn = nullptr);
+    TYPE* mk_csu(TYPE::KIND kind, const std::string& name, bool complete, bool lowered, uint64_t size, uint32_t align,
+                 bool cpp, bool is_struct_vector = false, uint32_t word = 0, PSN* psn = nullptr);
     TYPE* mk_class(const std::string& name, uint64_t size, uint32_t align, bool cpp);
     TYPE* mk_struct(const std::string& name, uint64_t size, uint32_t align, bool cpp);
     TYPE* mk_union(const std::string& name, uint64_t size, uint32_t align, bool cpp);
-    // Ownership of the chain passes to the type. Die with "Modifying frozen type:  TYPE::check_nfrozen" on a frozen one.
+    // Ownership of the chain passes to the type. Die with "Modifying frozen type:  TYPE::check_nfrozen" on a frozen
+    // one.
     void set_params(TYPE* t, fkPARAM* list);
     void set_etors(TYPE* t, fkETOR* list);
     void set_mdata(TYPE* t, fkMDATA* list);
     CSU_EXTRAS* make_csu_extras(TYPE* t); // the record of `t`, made on first use
-    // Marks a built class, enum, function or array as final and registers it; `t` becomes an existing equal type if any.
+    // Marks a built class, enum, function or array as final and registers it; `t` becomes an existing equal type if
+    // any.
     void type_frozen(TYPE*& t);
 
     TYPE* replace_array_elem(TYPE* array, TYPE* elem);
     TYPE* remove_known_qual(TYPE* t, unsigned bits); // without these bits at the outside and in array elements
     void delete_type_tree(TYPE* root, int recursive, int keep_root);
     void assign_uid(TYPE* t);
+    // Gives `t` its place at `base`: returns an equal type known there (`t` is then gone, or linked to it if it was
+    // open before and may be in use), else `t` itself with its `uid`. A type that is open or has its `uid` comes back
+    // as it is.
     TYPE* register_type(TYPE* t, TYPE* base);
 
     void set_error(TP_ERROR_CODE code, const char* format, ...);
@@ -416,13 +468,38 @@ public:
     static std::string demangle_type_name(const std::string& name, bool* is_cpp);
 
 private:
+    friend class TYPE;
     unsigned fake_counter = 0;
+    bool counted_m = false; // in `tp_count`
+    TYPE* vpred_m = nullptr;
+
+    TYPE* make(TYPE::KIND kind, TYPE* component, uint64_t size, uint32_t align, bool cpp);
+    TYPE* close(TYPE* t); // freezes and registers a node that is complete as made
+    std::string tag_name(const std::string& name);
+    void destroy(TYPE* t);
+    TYPE* find_equal(const TYPE* t, uint64_t key) const;
+    TYPE* rebuild_on(TYPE* shape, TYPE* component); // a type like `shape` on another component
+    TYPE* int_of_sign(TYPE* t, bool is_signed, const char* who);
+    TYPE* flagged_int(TYPE* t, bool boolean, bool ptm, const char* who);
+};
+
+// Switches of `merge_types`.
+struct TYPE_MERGE_OPTS {
+    // Only asks whether one type may stand as a redefinition of the other: nothing is linked, nothing is filled in.
+    static bool is_redefinition_m;
 };
 
 // The package of this run; null until the driver makes it.
 extern TYPE_PKG* tp;
 
 TYPE* base_type(TYPE* t); // the type that `t` is registered under
+// Key of `t` in its base's map: the source's spelling of the name of a named type, "$$fake" and the kind for a tagless
+// one,
+// "__builtin_type" for the others.
+const std::string& map_name(TYPE* t);
+// All types that hang from `root`, itself first, in tree order: a type, then what is built on it, by map name, then by
+// age.
+std::vector<TYPE*> type_tree_order(TYPE* root);
 bool type_is_tagless(const TYPE* t);
 bool exact_types(const TYPE* a, const TYPE* b);
 bool compatible_types(const TYPE* a, const TYPE* b, bool strict);
@@ -434,10 +511,15 @@ bool find_equivalent_type(TYPE* t);
 bool is_same_sign(const TYPE* a, const TYPE* b);
 bool equal_params(const fkPARAM* a, const fkPARAM* b);
 bool equal_etors(const fkETOR* a, const fkETOR* b);
-bool mdata_equal(const fkMDATA* a, const fkMDATA* b);
+bool mdata_equal(const fkMDATA* a, const fkMDATA* b);  // as members of merged types; merges the members' types
+bool compare_type_names(const TYPE* a, const TYPE* b); // equal tags, or both tagless
 TYPE* c_integral_promotions(TYPE* t);
 TYPE* c_usual_arith_conv(TYPE* a, TYPE* b);
-// Whether a scalar container of `container_bits` that starts on a container boundary from bit `start` may hold a field of
-// `width` bits at bit `offset`. `*out` receives the container's bit offset.
+// Whether a scalar container of `container_bits` that starts on a container boundary from bit `start` may hold a field
+// of `width` bits at bit `offset`. `*out` receives the container's bit offset.
 bool get_container_offset_for_field(int start, int container_bits, int offset, int width, int* out);
 bool is_legal_container_for_field(int start, int container_bits, int offset, int width);
+// Marks the parameter types of a function type for output.
+void mark_func_args(TYPE* func);
+// Appends one letter code a parameter to `name`: how the instances of an overloaded built-in are told apart.
+std::string mangle_overloaded_builtin_function_argtypes(const std::string& name, const std::vector<TYPE*>& args);

@@ -65,6 +65,10 @@ public:
 // ---- Building and numbering
 void buildcfg();
 void rebuildcfg();
+// Counts the LABELREFs of every label anew; `renumber_bblocks` does so itself.
+void recount_label_references();
+// Visits every LABELREF of a control statement, in written order; other statements name no labels.
+template <class F> void for_each_branch_target(NODE* tree, F&& visit);
 void renumber_bblocks();
 BBLK* mkbblock(LIST* list, BBLK* next, FUNINFO* funinfo);
 BBLK* insert_new_bb(int uon, BBLK* after, LIST* list);
@@ -90,6 +94,9 @@ void disconnect(BBLK* from, BBLK* to);
 BBLK* split_cfg_edge(BBLK* a, BBLK* b);
 void split_critical_edges(bool all);
 bool bb_is_split_critical_edge(const BBLK* bb);
+// Answers and upkeep of the loop analysis for edge splitting; null while it does not run.
+extern bool (*edge_is_loop_back_edge)(const BBLK* from, const BBLK* to);
+extern void (*loop_edge_was_split)(BBLK* from, BBLK* middle, BBLK* to);
 void subst_bb_for_bb_in_bb(BBLK* to, BBLK* from, BBLK* in);
 void subst_bb_for_bb_in_stmts(BBLK* to, BBLK* from, LIST* list);
 void remap_labelrefs(NODE* tree, LBL* from, LBL* to);
@@ -110,3 +117,22 @@ int validate_cfg();
 int validate_stmts();
 void prbblocks(BBLK* first, BBLK* last); // block structure to the debug stream
 void prbbinfix(FILE* out);               // every block of the current function with its statements in infix form
+
+// ---- Inline
+
+template <class F> void for_each_branch_target(NODE* tree, F&& visit) {
+    if (tree->op == BRANCH) {
+        visit(tree->left);
+        return;
+    }
+    if (tree->op != IF && tree->op != SWITCH && tree->op != CBRANCH) return;
+    // A case list leans left: the last element is on the right of the outermost COMMA.
+    std::vector<NODE*> elements;
+    NODE* t = tree->right;
+    for (; t && t->op == COMMA; t = t->left) elements.push_back(t->right);
+    if (t) elements.push_back(t);
+    for (auto it = elements.rbegin(); it != elements.rend(); ++it) {
+        NODE* e = (*it)->op == CASE ? (*it)->right : (*it)->op == DEFAULT ? (*it)->left : *it;
+        if (e && e->op == LABELREF) visit(e);
+    }
+}

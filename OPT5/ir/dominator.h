@@ -44,5 +44,8 @@ private:
     int exit_dfn = 0;
 };
 
+// The live-variable analysis of the scalar room; null before it is installed.
+extern void (*find_live_variables_hook)(int, int);
+
 // Creates or rebuilds the current function's record; with `with_live_variables` the live sets too.
 void compute_dominators(bool with_live_variables);

@@ -65,8 +65,9 @@ struct CALLEE {
 
 struct EHT_CATCH {
     std::string type_name;
-    int64_t label = 0;
+    int64_t label = 0; // label number of the handler
     bool flag = false;
+    int32_t id = 0; // from 1 in the order of the input, unique in the function; cases of a dispatch name it
 };
 // The in-memory exception table entry; slot 0 of a function's vector is the root.
 struct EHT_ITEM {
@@ -115,13 +116,14 @@ public:
     SYMTAB* pending_syms = nullptr;
     SYMTAB* memory_syms = nullptr; // parameters too
     SYMTAB* scalar_syms = nullptr;
+    std::vector<SYMTAB*> dropped_syms; // of class 6: on no list
     SYM_RANGE* widened = nullptr;
     SYM_RANGE* shortened = nullptr;
     LS* ls_root = nullptr;
     uint32_t ls_counter = 1;
     PTR* ptrs = nullptr; // all records, most recent first
     PTR* bottom_ptr = nullptr;
-    std::map<std::pair<int32_t, fkMDATA*>, PTR*> ptr_map; // locals by index
+    std::map<std::pair<SYMTAB*, fkMDATA*>, PTR*> ptr_map; // looked up, never walked
     OVERLAP* overlaps = nullptr;
     uint32_t name_counter = 0;
     bool address_taken_local = false, has_bitfield_access = false, has_cqual10_name = false;

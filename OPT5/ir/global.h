@@ -67,6 +67,8 @@ extern bool any_unions_in_program;
 extern int lex; // scope depth while reading
 
 void reset_global_flags(); // the defaults
+// Called where the work on a function ends. The options of a function are not copied into flags, so it reports only.
+void restore_global_flags();
 
 // ---- Switches that more than one room reads
 extern register_option pass_debug_SIMD, pass_debug_dump_serial;

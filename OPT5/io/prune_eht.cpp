@@ -1,0 +1,114 @@
+// Pruning of a function's exception table: entries that no call reaches go, chains skip what does nothing, ids close up.
+
+#include "OPT5/io/write.h"
+
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "UTIL/abort.h"
+
+namespace {
+
+// Calls stand anywhere but in the target lists of SWITCH and IF.
+void collect_calls(NODE* t, std::vector<NODE*>& calls) {
+    for (; t; t = t->right) {
+        if (op_is_call(t->op) && t->eh_entry) calls.push_back(t);
+        collect_calls(t->left, calls);
+        if (t->op == SWITCH || t->op == IF) return;
+    }
+}
+
+class PRUNER {
+public:
+    explicit PRUNER(FUNINFO* funinfo) : f(funinfo), eht(funinfo->eht), n(funinfo->eht.size()) {}
+
+    void run() {
+        if (n == 0) return;
+        mark_used();
+        mark_kept();
+        shorten_chains();
+        extend_used();
+        compact();
+    }
+
+private:
+    void mark_used() {
+        used.assign(n, false);
+        used[0] = true;
+        if (n > 1) used[1] = true;
+        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
+            for (LIST* s = bb->statements; s; s = s->rest) collect_calls(s->first, calls);
+        for (EHT_ITEM& item : eht)
+            if (item.kind == EHK_CLEANUP) collect_calls(item.cleanup, calls);
+        for (NODE* call : calls) used[call->eh_entry] = true;
+    }
+
+    void mark_kept() {
+        kept.assign(n, false);
+        kept[0] = true;
+        for (size_t i = 1; i < n; ++i) switch (eht[i].kind) {
+            case EHK_ROOT_NODE:
+            case EHK_CATCH:
+            case EHK_THROW_TERMINATE: kept[i] = true; break;
+            case EHK_CLEANUP:
+            case EHK_CATCH_END: kept[i] = kept[eht[i].next_entry] = true; break;
+            default: break;
+            }
+    }
+
+    // Every chain ends at the root, or is a ring that the input made: a walk of n steps decides.
+    uint32_t first_kept(uint32_t id) const {
+        for (size_t steps = 0; !kept[id] && steps < n; ++steps) id = eht[id].next_entry;
+        return kept[id] ? id : EHT_ROOT_ID;
+    }
+
+    void shorten_chains() {
+        for (size_t i = 1; i < n; ++i) {
+            OPT_ASSERT(kept[i] || eht[i].kind == EHK_CLEANUP_END);
+            eht[i].next_entry = first_kept(eht[i].next_entry);
+        }
+        for (NODE* call : calls) {
+            call->eh_entry = first_kept(call->eh_entry);
+            used[call->eh_entry] = true;
+        }
+    }
+
+    void extend_used() {
+        for (size_t i = 0; i < n; ++i) {
+            if (!used[i]) continue;
+            for (uint32_t next = eht[i].next_entry; !used[next]; next = eht[next].next_entry) used[next] = true;
+        }
+    }
+
+    void compact() {
+        std::vector<uint32_t> new_ids(n, 0);
+        uint32_t count = 0;
+        for (size_t i = 1; i < n; ++i)
+            if (used[i]) new_ids[i] = ++count;
+        if (count + 1 == n) return;
+        for (size_t i = 1; i < n; ++i) {
+            if (!used[i]) {
+                erase_tree(eht[i].cleanup);
+                continue;
+            }
+            OPT_ASSERT(new_ids[eht[i].id] != 0);
+            EHT_ITEM item = std::move(eht[i]);
+            item.id = new_ids[item.id];
+            item.next_entry = new_ids[item.next_entry];
+            eht[new_ids[i]] = std::move(item);
+        }
+        eht.resize(count + 1);
+        for (NODE* call : calls) call->eh_entry = new_ids[call->eh_entry];
+    }
+
+    FUNINFO* f;
+    std::vector<EHT_ITEM>& eht;
+    const size_t n;
+    std::vector<bool> used, kept;
+    std::vector<NODE*> calls;
+};
+
+} // namespace
+
+void prune_exception_table() { PRUNER(currfuninfo).run(); }

@@ -1,0 +1,26 @@
+// Reading an I-file into the representation: the optimizer's client of the I-file layer.
+//
+// When `if_read_file` returns, every function has its FUNINFO, its symbols and its control-flow graph, and `functions`
+// holds every defined function in file order. Input that the format allows and the optimizer cannot take (a label that
+// is defined twice or not at all, scopes that do not nest) ends in `if_error`.
+#pragma once
+
+#include "IFILE/if_client.h"
+#include "OPT5/ir/node.h"
+#include "OPT5/ir/symtab.h"
+
+IF_CLIENT* opt_client(); // the one object, owned by the room
+
+extern SYMTAB* mcall_implicit_state_symbol; // the object that stands for the state that machine operations share
+extern NODE* mcall_implicit_state_tree;     // reads it through a pointer; shared, copy it
+extern int output_index;
+
+bool is_implicit_state_argument(const NODE* tree); // the hidden operand of a machine operation
+
+// The first, local clean-up of a tree just read, operands first. Consumes the tree.
+NODE* expr_cleanup(NODE* tree);
+// An MCALL or UMCALL just read: an unknown one becomes a call, a known one with side effects gets the hidden operand.
+NODE* cleanup_intrinsic(NODE* call);
+// Moves the hint of `__builtin_expect` between a condition and the labels of its branch.
+void convert_CBRANCH_with_builtin_expect(NODE* cbranch);
+void revert_CBRANCH_with_builtin_expect(NODE* cbranch);

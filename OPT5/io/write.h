@@ -1,0 +1,40 @@
+// Writing functions and the end of the unit into the output I-file.
+#pragma once
+
+#include "UTIL/psn.h"
+
+#include <string>
+#include <vector>
+
+class NODE;
+class SYMTAB;
+struct LBL;
+struct LIST;
+
+// The last step of every function: prepares it for the code generator, writes its records and frees its body. A function
+// that is suppressed leaves no records.
+void output_function();
+// After the last function: symbols' final types and retention, then the initializers. The caller closes the file.
+void write_end_of_unit();
+
+void write_func_header();
+void write_func_body();
+void wrbblocks();
+void wrexpr(LIST* element);
+void wrbdlr(const LBL* labels);  // a label record for each label that is referenced
+NODE* wrtree(NODE* tree);        // the pre-write walk, then the tree's records; returns what the tree became
+NODE* prepare_tree_for_writing(NODE* tree); // the pre-write walk alone
+void wrasmr(int kind, const char* text, PSN* psn); // 47 a comment, 36 inline assembly
+void wrstcr(int kind, PSN* psn);                   // a control record
+void wrsfid(const char* name);                     // a source file record in the body
+// Gives a symbol its declared type back where the type it was worked on with means the same.
+void revert_symbol_type(SYMTAB* sym);
+// Removes what no call can reach from the current function's exception table and renumbers the rest.
+void prune_exception_table();
+
+// Comments of the register allocator, one a symbol; written and emptied with the function.
+struct REGISTER_ASSIGNMENT {
+    SYMTAB* sym;
+    std::string comment;
+};
+extern std::vector<REGISTER_ASSIGNMENT> register_assignments;

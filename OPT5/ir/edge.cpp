@@ -1,0 +1,222 @@
+// Edge lists and the graph edits that keep both ends of an edge in step.
+
+#include "OPT5/ir/bblk.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/ir/dominator.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+
+#include <algorithm>
+
+namespace {
+
+void mark_dominators_dirty(const BBLK* bb) {
+    if (bb->owner()->dominators) bb->owner()->dominators->dirty = true;
+}
+
+} // namespace
+
+EDGE* mkedge(BBLK* bb, EDGE* rest) { return new EDGE{bb, -1.0, rest}; }
+
+EDGE* edge_memberp(const BBLK* bb, EDGE* list) {
+    while (list && list->first != bb) list = list->rest;
+    return list;
+}
+
+EDGE* add_edge(BBLK* bb, EDGE* list, double prob) {
+    if (edge_memberp(bb, list)) return list;
+    return new EDGE{bb, prob, list};
+}
+
+EDGE* remove_edge(BBLK* bb, EDGE* list) {
+    for (EDGE** link = &list; *link; link = &(*link)->rest) {
+        if ((*link)->first != bb) continue;
+        EDGE* gone = *link;
+        *link = gone->rest;
+        delete gone;
+        break;
+    }
+    return list;
+}
+
+int edge_length(const EDGE* list) {
+    int n = 0;
+    for (; list; list = list->rest) ++n;
+    return n;
+}
+
+EDGE* rev_edge_list(EDGE* list) {
+    EDGE* out = nullptr;
+    while (list) {
+        EDGE* next = list->rest;
+        list->rest = out;
+        out = list;
+        list = next;
+    }
+    return out;
+}
+
+// By insertion: for short lists.
+EDGE* sort_edge_list(EDGE* list) {
+    EDGE* sorted = nullptr;
+    while (list) {
+        EDGE* next = list->rest;
+        EDGE** link = &sorted;
+        while (*link && (*link)->first->dfn <= list->first->dfn) link = &(*link)->rest;
+        list->rest = *link;
+        *link = list;
+        list = next;
+    }
+    return sorted;
+}
+
+EDGE* fast_sort_edge_list(EDGE* list) {
+    std::vector<EDGE*> cells;
+    for (; list; list = list->rest) cells.push_back(list);
+    std::stable_sort(cells.begin(), cells.end(), [](const EDGE* a, const EDGE* b) { return a->first->dfn < b->first->dfn; });
+    EDGE* sorted = nullptr;
+    for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
+        (*it)->rest = sorted;
+        sorted = *it;
+    }
+    return sorted;
+}
+
+EDGE* copy_edge_list(const EDGE* list) {
+    EDGE* out = nullptr;
+    EDGE** tail = &out;
+    for (; list; list = list->rest) {
+        *tail = new EDGE{list->first, list->prob, nullptr};
+        tail = &(*tail)->rest;
+    }
+    return out;
+}
+
+void erase_edge(EDGE* edge) { delete edge; }
+
+void erase_edge_list(EDGE* list) {
+    while (list) {
+        EDGE* next = list->rest;
+        delete list;
+        list = next;
+    }
+}
+
+void connect(BBLK* from, BBLK* to) {
+    from->successors = add_edge(to, from->successors);
+    to->predecessors = add_edge(from, to->predecessors);
+    mark_dominators_dirty(from);
+}
+
+void disconnect(BBLK* from, BBLK* to) {
+    from->successors = remove_edge(to, from->successors);
+    to->predecessors = remove_edge(from, to->predecessors);
+    mark_dominators_dirty(from);
+}
+
+// ---- Targets of control statements
+
+EDGE* list_branch_targets(NODE* tree, EDGE* list) {
+    // A block may be the target of many cases: `visited` marks what is on the list already.
+    std::vector<BBLK*> fresh;
+    for (EDGE* e = list; e; e = e->rest) e->first->visited = true;
+    for_each_branch_target(tree, [&](NODE* ref) {
+        BBLK* target = ref->lbl ? ref->lbl->bblock : nullptr;
+        if (!target || target->visited) return;
+        target->visited = true;
+        fresh.push_back(target);
+        list = mkedge(target, list);
+    });
+    for (EDGE* e = list; e; e = e->rest) e->first->visited = false;
+    return list;
+}
+
+void fixup_edge_lists(BBLK* bb, NODE* tree) {
+    EDGE* targets = list_branch_targets(tree, nullptr);
+    for (EDGE* e = targets; e; e = e->rest) connect(bb, e->first);
+    erase_edge_list(targets);
+}
+
+void remap_labelrefs(NODE* tree, LBL* from, LBL* to) {
+    for_each_node(tree, [=](NODE* t) {
+        if (t->op != LABELREF || t->lbl != from) return;
+        t->lbl = to;
+        t->u.lval = INT65(to->index);
+        if (from->refcount) --from->refcount;
+        ++to->refcount;
+    });
+}
+
+void subst_bb_for_bb_in_stmts(BBLK* to, BBLK* from, LIST* list) {
+    LBL* target = label_of_bb(to);
+    for (; list; list = list->rest)
+        for (LBL* lbl = from->label; lbl; lbl = lbl->next) remap_labelrefs(list->first, lbl, target);
+}
+
+void subst_bb_for_bb_in_bb(BBLK* to, BBLK* from, BBLK* in) { subst_bb_for_bb_in_stmts(to, from, in->last_statement()); }
+
+// ---- Splitting
+
+bool (*edge_is_loop_back_edge)(const BBLK* from, const BBLK* to) = nullptr;
+void (*loop_edge_was_split)(BBLK* from, BBLK* middle, BBLK* to) = nullptr;
+
+namespace {
+
+// Makes block n between `a` and `b`; the depth-first numbers are stale afterwards.
+BBLK* make_block_on_edge(BBLK* a, BBLK* b) {
+    LIST* last = a->last_statement();
+    a->successors = remove_edge(b, a->successors);
+    b->predecessors = remove_edge(a, b->predecessors);
+    BBLK* n = insert_new_bb_with_branch(-1, a, b, last ? last->psn : nullptr);
+    a->successors = add_edge(n, a->successors);
+    n->predecessors = mkedge(a, nullptr);
+    subst_bb_for_bb_in_bb(n, b, a);
+    if (a->owner()->lva_sym_count > 0 && b->live_sets[0]) {
+        n->live_sets[0] = new BITVEC(*b->live_sets[0]);
+        n->live_sets[1] = new BITVEC(*b->live_sets[0]);
+        for (int i : {2, 3}) n->live_sets[i] = new BITVEC(b->live_sets[0]->bits);
+    }
+    mark_dominators_dirty(a);
+    return n;
+}
+
+// An edge that need not be split unless every critical edge has to go: a forward edge outside loops, and the back edge
+// of a loop.
+bool edge_may_stay(const BBLK* a, const BBLK* b) {
+    if (!a->loop) return a->dfn < b->dfn;
+    return a->loop == b->loop && edge_is_loop_back_edge && edge_is_loop_back_edge(a, b);
+}
+
+} // namespace
+
+BBLK* split_cfg_edge(BBLK* a, BBLK* b) {
+    BBLK* n = make_block_on_edge(a, b);
+    renumber_bblocks();
+    return n;
+}
+
+void split_critical_edges(bool all) {
+    if (!currfuninfo->bb_list) return;
+    bool changed = false;
+    BBLK* const entry = currfuninfo->bb_list;
+    for (BBLK* a = entry->rdflink; a; a = a == entry ? nullptr : a->rdflink) {
+        if (!a->successors || !a->successors->rest) continue;
+        for (EDGE* e = a->successors; e;) {
+            BBLK* b = e->first;
+            e = e->rest;
+            if (!b->predecessors || !b->predecessors->rest || (!all && edge_may_stay(a, b))) continue;
+            debug_printf("Splitting critical edge between BB%d and BB%d\n", a->dfn, b->dfn);
+            BBLK* n = make_block_on_edge(a, b);
+            if (a->loop && b->loop && loop_edge_was_split) loop_edge_was_split(a, n, b);
+            e = a->successors; // the list has changed
+            changed = true;
+        }
+    }
+    if (changed) renumber_bblocks();
+}
+
+bool bb_is_split_critical_edge(const BBLK* bb) {
+    if (edge_length(bb->predecessors) != 1 || edge_length(bb->successors) != 1) return false;
+    return edge_length(bb->predecessors->first->successors) >= 2 && edge_length(bb->successors->first->predecessors) >= 2;
+}

@@ -8,6 +8,7 @@ void erase_loop_hierarchy() {}
 void reinsert_loop_pragmas() {}
 NODE* normalize_tree(NODE* tree, NODE*) { return tree; }
 NODE* denormalize_tree(NODE* tree, bool) { return tree; }
+void split_qualified_parameter_copies() {}
 void construct_SSA_form(bool, bool, bool) {}
 void deconstruct_SSA_form() {}
 void clone_SSA_NASSERTs() {}

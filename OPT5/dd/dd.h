@@ -14,6 +14,10 @@ void reinsert_loop_pragmas();
 NODE* normalize_tree(NODE* tree, NODE* statement);
 NODE* denormalize_tree(NODE* tree, bool keep_ddnodes);
 
+// A parameter copy of the argument prolog that copies a scalar with a qualifier that bars optimization is split: a
+// local without the qualifier takes the value.
+void split_qualified_parameter_copies();
+
 // SSA form of the current function and the passes on it.
 void construct_SSA_form(bool with_memory, bool with_fields, bool scalars_only);
 void deconstruct_SSA_form();

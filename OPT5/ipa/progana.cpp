@@ -2,6 +2,8 @@
 // meaning, and what is not known is assumed not to hold.
 #include "OPT5/ipa/progana.h"
 
+FUNLIST* cg_list = nullptr;
+
 void analyze_global_symbols() {}
 void detect_recursion() {}
 void dump_call_graph_debug() {}

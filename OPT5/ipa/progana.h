@@ -10,7 +10,12 @@ void analyze_global_symbols();
 void detect_recursion();
 void dump_call_graph_debug();
 
-// After it `cg_order` of each record is set, or is -1 for all: then there is no call graph.
+// The functions in call-graph order, the record of the file first; null until the graph is built, and where it cannot be.
+struct FUNLIST {
+    FUNINFO* fun;
+    FUNLIST* next;
+};
+extern FUNLIST* cg_list;
 void set_up_and_build_call_graph();
 
 // What the reader calls for each function, tree and symbol.

@@ -2,6 +2,8 @@
 // meaning, and what is not known is assumed not to hold.
 #include "OPT5/scalar/lowering.h"
 
+int GO_FOR_INSTRUMENTATION = 0;
+
 void expand_bitfields() {}
 void explode_auto_struct_vars() {}
 void transform_DIVs_by_ICONs() {}

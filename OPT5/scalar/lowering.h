@@ -29,5 +29,7 @@ void promote_all_embedded_assignments();
 void expand_cluster_refs();
 void collect_clustered_symbols();
 
+// The program is being built for instrumentation; no option of this family asks for it.
+extern int GO_FOR_INSTRUMENTATION;
 // Registers the exit routine of the instrumentation in `main`.
 void add_instrumentation_exit_routine_to_atexit();

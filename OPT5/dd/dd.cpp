@@ -19,18 +19,18 @@ void promote_vars_to_registers(bool) {}
 void init_dependence_analysis() {}
 void wrapup_dependence_analysis(bool) {}
 void report_all_dependences() {}
-void report_ambiguous_aliases(LOOP*) {}
-void find_loop_assertions(LOOP*) {}
-bool sink_unused_definitions(LOOP*) { return false; }
-void undeltafy_dd_loops(LOOP*) {}
-void add_downcounters_to_loops(LOOP*, bool, bool) {}
-void collapse_dd_loops(LOOP*) {}
-void sr_circular_addressing_in_loop(LOOP*) {}
-void sr_DIV_and_MOD_in_loop(LOOP*, bool) {}
-void do_loop_if_interchange(LOOP*) {}
-void unroll_and_jam_loop_nest(LOOP*, bool, bool) {}
-void unroll_loops_for_SP(LOOP*) {}
-void interleave_reductions_in_loop(LOOP*, bool) {}
+void report_ambiguous_aliases(struct LOOP*) {}
+void find_loop_assertions(struct LOOP*) {}
+bool sink_unused_definitions(struct LOOP*) { return false; }
+void undeltafy_dd_loops(struct LOOP*) {}
+void add_downcounters_to_loops(struct LOOP*, bool, bool) {}
+void collapse_dd_loops(struct LOOP*) {}
+void sr_circular_addressing_in_loop(struct LOOP*) {}
+void sr_DIV_and_MOD_in_loop(struct LOOP*, bool) {}
+void do_loop_if_interchange(struct LOOP*) {}
+void unroll_and_jam_loop_nest(struct LOOP*, bool, bool) {}
+void unroll_loops_for_SP(struct LOOP*) {}
+void interleave_reductions_in_loop(struct LOOP*, bool) {}
 void explode_local_arrays() {}
 void special_DMAC_conversion() {}
 void rotate_loops_for_accumulators() {}

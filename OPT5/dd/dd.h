@@ -2,7 +2,7 @@
 #pragma once
 
 class NODE;
-struct LOOP;
+struct LOOP; // written out where it is used: an opcode has the same name
 
 // The hierarchy's root is held by the first block, null without.
 void build_loop_hierarchy(bool full, bool ssa, bool scalars, bool pragmas);
@@ -31,20 +31,20 @@ void promote_vars_to_registers(bool with_assertions);
 void init_dependence_analysis();
 void wrapup_dependence_analysis(bool keep);
 void report_all_dependences();
-void report_ambiguous_aliases(LOOP* loop);
+void report_ambiguous_aliases(struct LOOP* loop);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
-void find_loop_assertions(LOOP* loop);
-bool sink_unused_definitions(LOOP* loop);
-void undeltafy_dd_loops(LOOP* loop);
-void add_downcounters_to_loops(LOOP* loop, bool recurse, bool all);
-void collapse_dd_loops(LOOP* loop);
-void sr_circular_addressing_in_loop(LOOP* loop);
-void sr_DIV_and_MOD_in_loop(LOOP* loop, bool recurse);
-void do_loop_if_interchange(LOOP* loop);
-void unroll_and_jam_loop_nest(LOOP* loop, bool recurse, bool all);
-void unroll_loops_for_SP(LOOP* loop);
-void interleave_reductions_in_loop(LOOP* loop, bool recurse);
+void find_loop_assertions(struct LOOP* loop);
+bool sink_unused_definitions(struct LOOP* loop);
+void undeltafy_dd_loops(struct LOOP* loop);
+void add_downcounters_to_loops(struct LOOP* loop, bool recurse, bool all);
+void collapse_dd_loops(struct LOOP* loop);
+void sr_circular_addressing_in_loop(struct LOOP* loop);
+void sr_DIV_and_MOD_in_loop(struct LOOP* loop, bool recurse);
+void do_loop_if_interchange(struct LOOP* loop);
+void unroll_and_jam_loop_nest(struct LOOP* loop, bool recurse, bool all);
+void unroll_loops_for_SP(struct LOOP* loop);
+void interleave_reductions_in_loop(struct LOOP* loop, bool recurse);
 void explode_local_arrays();
 
 // Forms of the dual multiply-accumulate and its accumulators.

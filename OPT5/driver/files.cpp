@@ -1,0 +1,200 @@
+// The files of a run: opened in a fixed order, so that nothing is written before everything that can be wrong with the
+// command line and the input's header has been checked, and closed with a check that all was written.
+#include "BANNER/banner.h"
+#include "HOST/file_names.h"
+#include "IFILE/ifile.h"
+#include "OPT5/driver/driver.h"
+#include "OPT5/io/read.h"
+#include "OPT5/ipa/inline.h"
+#include "OPT5/ir/global.h"
+#include "TYPES/type.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+
+namespace {
+
+register_option pass_debug_help("debug:help");
+
+std::string info_name, debug_name;
+FILE* output_stream = nullptr; // until the I_FILE takes it over
+
+[[noreturn]] void cannot_open(const char* what, const std::string& name) {
+    std::fprintf(stderr, "\n>> Cannot Open %s File, %s : %s, Aborting\n", what, std::strerror(errno), name.c_str());
+    std::exit(1);
+}
+
+// Writing a file that another one of the run lives in would destroy both.
+void refuse_same_file(const std::string& name, const std::string& other, const char* other_role) {
+    if (other.empty() || !is_same_file(name, other)) return;
+    std::fprintf(stderr, "zopt: %s: would overwrite the %s file\n", name.c_str(), other_role);
+    std::exit(1);
+}
+
+void open_input() {
+    FILE* const stream = std::fopen(i_file_name.c_str(), "rb");
+    if (!stream) cannot_open("Input icode", i_file_name);
+    std::string why;
+    i_file = I_FILE::if_open(stream, opt_client(), &why);
+    if (i_file) return;
+    std::fprintf(stderr, "\n>> Error when opening input icode file : %s, Aborting\n", i_file_name.c_str());
+    if (!why.empty()) std::fprintf(stderr, "zopt: %s: %s\n", i_file_name.c_str(), why.c_str());
+    std::exit(1);
+}
+
+void settle_debug_options() {
+    if (!file_options->getopt(option_obj::OO_print_debug)) return;
+    if (file_options->getnumarg(option_obj::OO_gen_opt_info) == 0)
+        file_options->setopt(option_obj::OO_gen_opt_info, 1L);
+    switch (file_options->getnumarg(option_obj::OO_size_speed_goal)) {
+    case option_obj::OV_SIZE_SPEED_GOAL_0:
+    case option_obj::OV_SIZE_SPEED_GOAL_1:
+    case option_obj::OV_SIZE_SPEED_GOAL_2:
+    case option_obj::OV_SIZE_SPEED_GOAL_3: std::fputs("\n\t*** Optimizing code size, not speed ***\n\n", stderr);
+    }
+}
+
+void settle_output_name(int names) {
+    if (names == 1) {
+        o_file_name = replace_extension(i_file_name, ".opt");
+    } else if (names > 2) {
+        std::fputs("\n>>>> OPTIMIZER ERROR: Garbage on command line\n\n", stderr);
+        std::exit(1);
+    }
+    refuse_same_file(o_file_name, i_file_name, "input");
+}
+
+void open_info_file() {
+    const long level = file_options->getnumarg(option_obj::OO_opt_level);
+    const bool high = level == option_obj::OV_OPT_LEVEL_3 || level == option_obj::OV_OPT_LEVEL_4;
+    if (!high && !file_options->getopt(option_obj::OO_print_debug)) file_options->clearopt(option_obj::OO_gen_opt_info);
+    write_opt_info = static_cast<int>(file_options->getnumarg(option_obj::OO_gen_opt_info));
+    if (write_opt_info == 0) return;
+    const char* const given = file_options->getstrarg(option_obj::OO_opt_info_filename);
+    info_name = given ? given : replace_extension(i_file_name, ".nfo");
+    refuse_same_file(info_name, i_file_name, "input");
+    finfo = std::fopen(info_name.c_str(), "w");
+    if (!finfo) cannot_open("Info", info_name);
+    print_toolversion(finfo);
+}
+
+void open_output() {
+    refuse_same_file(o_file_name, info_name, "info");
+    refuse_same_file(o_file_name, debug_name, "debug");
+    output_stream = std::fopen(o_file_name.c_str(), "wb");
+    if (!output_stream) cannot_open("Output icode", o_file_name);
+    o_file = I_FILE::if_create(output_stream, tp, i_file->source_name.c_str());
+    for (const OPTION_SET& set : icode_optionlist) o_file->if_enter_option_set(set);
+}
+
+void warn_of_volatile_variables() {
+    constexpr char text[] = "\n>>>> Warning: All non-auto lvalues are considered VOLATILE.\n\n";
+    if (!volit_vars) return;
+    debug_printf("%s", text);
+    std::fputs(text, stderr);
+}
+
+} // namespace
+
+void open_files(int argc, char** argv) {
+    install_common_handlers(argc > 0 ? argv[0] : nullptr, write_termination_notes);
+    const int names = parse_command_line(argc, argv);
+    if (names == 0) {
+        std::fprintf(stderr, "Usage: %s [-options] filename\n", option_obj::executable_name);
+        std::exit(1);
+    }
+    open_input();
+    build_option_sets();
+    if (file_options->getopt(option_obj::OO_dump_options)) {
+        file_options->dump(0);
+        std::exit(0);
+    }
+    reset_global_flags();
+    std::memset(aux_cmd_flag, 0, sizeof aux_cmd_flag);
+    set_global_flags(file_options);
+    if (pass_debug_help) register_option::dump();
+    tp = new TYPE_PKG();
+    TYPE_PKG::init_type_pkg(tp);
+    i_file->if_type_init(tp);
+    settle_debug_options();
+    settle_output_name(names);
+    open_info_file();
+    if (file_options->getnumarg(option_obj::OO_print_debug) > 0) {
+        open_debug_file(1, nullptr, nullptr);
+        print_debug = static_cast<int>(file_options->getnumarg(option_obj::OO_print_debug));
+    }
+    init_proc_integration();
+    open_output();
+    warn_of_volatile_variables();
+    emit_cmd_line_text(argc, argv);
+}
+
+void open_debug_file(int fatal, const char* suffix, const char* mode) {
+    if (!suffix && fdebug) return;
+    const std::string name = debug_file_name(i_file_name, suffix);
+    if (fdebug) debug_printf(">>>> SWITCHING LOG TO %s\n", name.c_str());
+    const bool overwrites = is_same_file(name, i_file_name) || (o_file && is_same_file(name, o_file_name));
+    if (overwrites) errno = EEXIST;
+    FILE* const stream = overwrites ? nullptr : std::fopen(name.c_str(), mode ? mode : "w");
+    if (!stream) {
+        std::fprintf(stderr, "\n>> Cannot Open Debug File, %s : %s, Aborting\n", std::strerror(errno), name.c_str());
+        if (fatal) std::exit(1);
+    }
+    if (!suffix) debug_name = name;
+    fdebug = stream ? stream : stderr;
+}
+
+void close_debug_stream() {
+    if (fdebug && fdebug != stderr) std::fclose(fdebug);
+    fdebug = nullptr;
+}
+
+void discard_output() {
+    if (!o_file && !output_stream) return;
+    if (o_file) I_FILE::if_close(o_file, true, true);
+    if (i_file) I_FILE::if_close(i_file, true, false);
+    o_file = i_file = nullptr;
+    output_stream = nullptr;
+    // A device or a pipe is not ours to remove.
+    if (is_regular_file(o_file_name)) std::remove(o_file_name.c_str());
+}
+
+void fail_run(const std::string& text) {
+    std::fflush(stdout);
+    discard_output();
+    std::fprintf(stderr, "%s\n", text.c_str());
+    std::exit(1);
+}
+
+namespace {
+
+// Closes a text file of the run with its last line. False if something of it could not be written.
+bool finish_text_file(FILE*& file, const char* last_line) {
+    FILE* const f = file;
+    file = nullptr;
+    if (!f || f == stderr) return true;
+    std::fputs(last_line, f);
+    const bool failed = std::ferror(f) != 0;
+    return std::fclose(f) == 0 && !failed;
+}
+
+} // namespace
+
+void close_files() {
+    // The output refers to positions and names that the input's reader owns.
+    errno = 0;
+    const bool output_failed = I_FILE::if_close(o_file, true, false) != 0;
+    const int reason = errno;
+    o_file = nullptr;
+    output_stream = nullptr;
+    I_FILE::if_close(i_file, true, false);
+    i_file = nullptr;
+    const bool debug_good = finish_text_file(fdebug, "\n== END OF DEBUG OUTPUT==\n");
+    const bool info_good = finish_text_file(finfo, "\n== END OF INFO OUTPUT==\n");
+    if (!output_failed && debug_good && info_good) return;
+    const std::string& name = output_failed ? o_file_name : debug_good ? info_name : debug_name;
+    if (is_regular_file(o_file_name)) std::remove(o_file_name.c_str());
+    std::fprintf(stderr, "zopt: %s: cannot write: %s\n", name.c_str(), std::strerror(reason ? reason : EIO));
+    std::exit(1);
+}

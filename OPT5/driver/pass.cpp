@@ -1,0 +1,153 @@
+// Running one step, and choosing the order of all.
+#include "OPT5/driver/passes.h"
+
+#include "OPT5/driver/driver.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "UTIL/abort.h"
+
+#include <cctype>
+#include <cerrno>
+#include <climits>
+#include <cstdlib>
+#include <ctime>
+
+pass_manager global_pass_manager;
+std::vector<pass*> normal_order, permuted_order;
+
+namespace {
+
+register_option pass_debug_skip_pass("debug:skip_pass"), pass_debug_list_passes("debug:list_passes"),
+    pass_debug_validate("debug:validate");
+
+bool current_function_has_blocks() { return currfuninfo && currfuninfo->bb_list; }
+
+void print_current_function() {
+    if (current_function_has_blocks() && fdebug) prbbinfix(fdebug);
+}
+
+void validate_current_function(const pass& step) {
+    if (!current_function_has_blocks()) return;
+    const int errors = validate_cfg() + validate_stmts();
+    if (errors == 0) return;
+    const std::string text =
+        "step " + std::to_string(step.serial) + " '" + step.name + "' left " + std::to_string(errors) + " errors";
+    abort_optimizer(text.c_str());
+}
+
+} // namespace
+
+void pass::run() {
+    if (pass_debug_skip_pass > 0 && static_cast<unsigned>(pass_debug_skip_pass) == serial) {
+        if (print_debug) {
+            debug_printf("\n\n\t\t\t---------- SKIPPING step %d '%s' ----------\n", static_cast<int>(serial),
+                         name.c_str());
+            debug_flush();
+        }
+        return;
+    }
+    if (print_debug) {
+        debug_printf("\n\n\t\t\t---------- ENTERING step %d '%s' ----------\n", static_cast<int>(serial), name.c_str());
+        debug_flush();
+        print_current_function();
+    }
+    const bool timed = print_debug || enable_time_stats;
+    const clock_t start = timed ? std::clock() : 0;
+    FUNINFO* const funinfo = currfuninfo; // the last step leaves no current function
+    action();
+    if (timed) {
+        const clock_t ticks = std::clock() - start;
+        if (print_debug) debug_printf("(%.1f sec for pass.)\n", static_cast<double>(ticks) / CLOCKS_PER_SEC);
+        if (funinfo) funinfo->time += ticks;
+    }
+    if (print_debug) {
+        debug_printf("\n\n\n\t\t\t---------- EXITING step %d '%s' ----------\n", static_cast<int>(serial),
+                     name.c_str());
+        debug_flush();
+        print_current_function();
+    }
+    if (pass_debug_validate) validate_current_function(*this);
+}
+
+// ---- Orders
+
+void list_passes(FILE* out) {
+    for (const pass* step : normal_order)
+        std::fprintf(out, "%2d:  %s\n", static_cast<int>(step->serial), step->name.c_str());
+}
+
+namespace {
+
+std::vector<int> random_order(int n) {
+    std::vector<int> v(n, 0);
+    std::srand(static_cast<unsigned>(std::time(nullptr) + std::clock()));
+    constexpr double per_draw = 4.656612873077393e-10; // of a draw from [0, 2^31): a fraction of 1
+    for (int i = 0; i + 1 < n; ++i) {
+        const int j = static_cast<int>(std::rand() * (i + 2) * per_draw);
+        v[i + 1] = v[j];
+        v[j] = i + 1;
+    }
+    return v;
+}
+
+[[noreturn]] void bad_order(const std::string& what) { fail_run("zopt: the forced order of steps: " + what); }
+
+std::vector<int> listed_order(const char* text, int n) {
+    std::vector<int> v;
+    for (const char* p = text;;) {
+        while (*p == ',' || std::isspace(static_cast<unsigned char>(*p))) ++p;
+        if (!*p) return v;
+        char* end = nullptr;
+        errno = 0;
+        const long index = std::strtol(p, &end, 10);
+        if (end == p) bad_order("\"" + std::string(p) + "\" is no number");
+        if (errno != 0 || index < 0 || index >= n) {
+            const std::string message = "step " + std::string(p, end - p) + " of the forced order is not in the table";
+            abort_optimizer(message.c_str());
+        }
+        v.push_back(static_cast<int>(index));
+        p = end;
+    }
+}
+
+// What asks for an order, and in which words the report names it; null without.
+const char* forced_order(const char** source) {
+    *source = "command-line option";
+    if (file_options && file_options->getopt(option_obj::OO_opt_passes))
+        return file_options->getstrarg(option_obj::OO_opt_passes);
+    *source = "environment variable";
+    return std::getenv("FORCED_OPT_PASSES");
+}
+
+void choose_order() {
+    const char* source;
+    const char* const text = forced_order(&source);
+    if (!text) {
+        if (print_debug) debug_printf("Pass list is normal order.\n");
+        permuted_order = normal_order;
+        return;
+    }
+    const int n = static_cast<int>(normal_order.size());
+    const bool is_random = std::string(text) == "random";
+    const std::vector<int> order = is_random ? random_order(n) : listed_order(text, n);
+    for (int index : order) permuted_order.push_back(normal_order[index]);
+    if (!print_debug) return;
+    debug_printf("Pass list, from %s, is%s: ", source, is_random ? " (random)" : "");
+    for (int index : order) debug_printf(" %d", index);
+    debug_printf("%s\n\n", order.empty() ? "<empty>" : "");
+}
+
+} // namespace
+
+void setup_passes(bool use_forced) {
+    global_pass_manager.clear();
+    normal_order.clear();
+    permuted_order.clear();
+    add_normal_order_passes(normal_order);
+    if (use_forced)
+        choose_order();
+    else
+        permuted_order = normal_order;
+    if (pass_debug_list_passes && fdebug) list_passes(fdebug);
+}

@@ -114,9 +114,7 @@ NODE* mk_MCALL(const char* name, NODE* args, TYPE* type) {
 //
 // `x op= e` evaluates e before it reads x, and computes in the combined type of both before it converts to x's type;
 // `x = x op e` reads x first and computes in the operator's type. Each direction holds only where neither shows.
-namespace {
-
-bool compound_type_is(TYPE* wanted, int op, const NODE* x, const NODE* e) {
+bool compound_ASG_computes_in(TYPE* wanted, int op, const NODE* x, const NODE* e) {
     if (x->type->is_vector() || wanted->is_vector())
         return equiv_mtypes(x->type, wanted) && equiv_mtypes(e->type, wanted);
     if (x->type->is_pointer()) return (op == PLUS || op == MINUS) && e->type->is_int() && equiv_mtypes(x->type, wanted);
@@ -124,6 +122,8 @@ bool compound_type_is(TYPE* wanted, int op, const NODE* x, const NODE* e) {
     return x->type->is_arithmetic() && e->type->is_arithmetic() &&
            equiv_mtypes(is_shift ? promoted_type(x->type) : combined_type(x, e), wanted);
 }
+
+namespace {
 
 // A variable that nothing but its own NAME can change.
 bool is_private_name(const NODE* t) {
@@ -159,7 +159,7 @@ NODE* ASG_to_opASG(NODE* tree) {
         std::swap(rhs->left, rhs->right);
     }
     if (!trees_are_congruent(x, rhs->left, false) || tree_has_side_effects(rhs->right)) return tree;
-    if (!compound_type_is(rhs->type, rhs->op, x, rhs->right)) return tree;
+    if (!compound_ASG_computes_in(rhs->type, rhs->op, x, rhs->right)) return tree;
     tree->op = compound;
     tree->right = rhs->right;
     rhs->right = nullptr;

@@ -80,7 +80,9 @@ bool expr_is_constant(const NODE* t) {
     case LCON:
     case FCON:
     case ARGREF: return true;
-    case NAME: return !lvalue_is_volatile(t) && lvalue_is_immutable(t);
+    case NAME: // an automatic `const` has another value each time that its block is entered
+        return t->u.sym && (t->u.sym->is_global() || t->u.sym->sclass == SC_STATIC) && !lvalue_is_volatile(t) &&
+               lvalue_is_immutable(t);
     case UAND: {
         const NODE* object = t->left;
         while (object->op == STDOT) object = object->left;

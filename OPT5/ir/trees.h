@@ -32,8 +32,12 @@ NODE* mk_IF(NODE* cond, int32_t true_index, uint32_t true_profile, int32_t false
             LS* ls = nullptr);
 NODE* mk_IF(NODE* cond, NODE* true_labelref, NODE* false_labelref, LS* ls = nullptr);
 NODE* mk_ASM(int kind, const char* text); // kind 47 a comment, 36 inline assembly
+// Both keep the tree where the other form could give another value: `x op= e` evaluates e before it reads x, and
+// computes in the combined type of x and e.
 NODE* ASG_to_opASG(NODE* tree);
 NODE* opASG_to_ASG(NODE* tree);
+// `x op= e` computes in `wanted`, the type of `x op e`.
+bool compound_ASG_computes_in(TYPE* wanted, int op, const NODE* x, const NODE* e);
 void insert_stmt_before_stmt_in_bb(NODE* stmt, LIST* before, BBLK* bb, PSN* psn);
 void promote_toplevel_COMMAOPs_in_list(LIST* list);
 

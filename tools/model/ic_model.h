@@ -1,7 +1,7 @@
 // An I-file in memory, as the tools beside the optimizer hold it: read whole, looked at or executed, written again.
 //
-// Nodes, texts and records live in the unit's arena and are never freed one by one; a node is 72 bytes. Positions and file
-// names belong to the I_FILE that was read, which the unit keeps open as long as it lives.
+// Nodes, texts and records live in the unit's arena and are never freed one by one; a node is one cache line. Positions
+// and file names belong to the I_FILE that was read, which the unit keeps open as long as it lives.
 #pragma once
 
 #include "IFILE/ifile.h"
@@ -30,25 +30,24 @@ class IC_NODE final : public BASE_NODE {
 public:
     IC_NODE* left = nullptr;
     IC_NODE* right = nullptr;
-    // `value` of ICON; `text` of SCON, LCON, FCON and the calls by name; `sym` of NAME; `member` of FIELD, `csu` its type.
+    // `value` of ICON and, for its flags, of DDNODE; `text` of SCON, LCON, FCON and the calls by name; `sym` of NAME;
+    // `member` of FIELD.
     union {
         int64_t value = 0;
         IC_SYMBOL* sym;
         const char* text;
         fkMDATA* member;
     };
-    TYPE* csu = nullptr;
     // Label, cases, skip count, register, length of SCON, kind of FIELD, variable arguments, id of DDNODE, edge count.
     uint32_t number = 0;
     uint32_t number2 = 0; // exception entry, locale of DDNODE
-    uint8_t flags = 0;    // of DDNODE
 
     explicit IC_NODE(IC_ARENA* arena) : arena_m(arena) {}
 
     I_SYMTAB* name_symbol() const override;
     int field_kind() const override { return static_cast<int32_t>(number); }
     fkMDATA* field_mval() const override { return member; }
-    TYPE* field_csu() const override { return csu; }
+    TYPE* field_csu() const override { return csu_m; }
     uint32_t icon_uvalue() const override { return static_cast<uint32_t>(value); }
     int32_t icon_svalue() const override { return static_cast<int32_t>(value); }
     const char* lcon_value() const override { return text; }
@@ -61,7 +60,7 @@ public:
     uint32_t case_count() const override { return number; }
     uint32_t ddnode_id() const override { return number; }
     uint32_t ddnode_locale() const override { return number2; }
-    uint8_t ddnode_flags() const override { return flags; }
+    uint8_t ddnode_flags() const override { return static_cast<uint8_t>(value); }
     uint32_t call_num_vargs() const override { return number; }
     const char* icall_name() const override { return text; }
     uint32_t eh_entry_id() const override { return number2; }
@@ -72,7 +71,7 @@ public:
     void mk_field(int kind, fkMDATA* m, TYPE* structure) override {
         number = static_cast<uint32_t>(kind);
         member = m;
-        csu = structure;
+        csu_m = structure;
     }
     void mk_icon(int64_t v) override { value = v; }
     void mk_lcon(const char* t) override { text = arena_m->copy(t); }
@@ -88,7 +87,7 @@ public:
     void mk_ddnode(uint32_t id, uint32_t locale, uint8_t f) override {
         number = id;
         number2 = locale;
-        flags = f;
+        value = f;
     }
     void mk_call(uint32_t num_vargs, uint32_t eh_entry) override {
         number = num_vargs;
@@ -105,8 +104,12 @@ public:
     }
 
 private:
-    IC_ARENA* arena_m;
+    union {
+        IC_ARENA* arena_m; // until the payload is set
+        TYPE* csu_m;       // of FIELD
+    };
 };
+static_assert(sizeof(IC_NODE) <= 64);
 
 class IC_SYMBOL final : public I_SYMTAB {
 public:

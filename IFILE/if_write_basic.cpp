@@ -142,7 +142,6 @@ I_FILE* I_FILE::if_create(FILE* stream, TYPE_PKG* pkg, const char* source_name) 
     file->is_writer = true;
     file->type_pkg = pkg;
     file->source_name = source_name ? source_name : "";
-    std::setvbuf(stream, nullptr, _IONBF, 0); // this layer has a buffer of its own
     file->write_file_header();
     return file;
 }
@@ -168,9 +167,7 @@ void I_FILE::finish_output(bool keep_all_types) {
     }
     if (type_pkg) if_write_all_types(keep_all_types);
     // The names must be complete before their section is written.
-    for (I_SYMTAB* sym : globals) {
-        enter_position(sym->sym_psn());
-    }
+    for (I_SYMTAB* sym : globals) enter_position(sym->sym_psn());
     if (!file_table.empty()) {
         off_files = if_tell();
         for (const std::string& name : file_table) {
@@ -183,7 +180,8 @@ void I_FILE::finish_output(bool keep_all_types) {
     off_globals = if_tell();
     for (I_SYMTAB* sym : globals) if_write_symbol(sym);
     i_write_eof();
+    int64_t end = if_tell();
     if_seek(0);
     write_file_header();
-    drain();
+    if_seek(end);
 }

@@ -68,33 +68,24 @@ bool is_legal_container_for_field(int start, int container_bits, int offset, int
 
 // ---- Overloaded built-ins
 
+// Letters of the Itanium scheme. Pointers, arrays and vectors are a prefix to the code of what they are built on.
 static void append_code(std::string& out, const TYPE* t) {
     static const char* const ints = "bahwstijlmxy";
     static const char* const floats = "fde";
-    for (; t->is_pointer(); t = t->type_pointed_to()) out += 'P';
-    t = t->real;
-    switch (t->kind) {
-    case TYPE::tpk_void: out += 'v'; break;
-    case TYPE::tpk_int: out += t->is_plain_char() ? 'c' : ints[t->ikind()]; break;
-    case TYPE::tpk_float: out += floats[t->fkind()]; break;
-    case TYPE::tpk_complex:
-        out += 'C';
-        append_code(out, t->component());
-        break;
-    case TYPE::tpk_array:
-        if (t->is_vector()) {
-            out += "Dv" + std::to_string(t->num_elem()) + "_";
-        } else {
-            out += "A" + std::to_string(t->num_elem()) + "_";
-            for (t = t->component()->real; t->kind == TYPE::tpk_array && !t->is_vector(); t = t->component()->real)
-                out += "A" + std::to_string(t->num_elem()) + "_";
-            out += 'E'; // the element of an array follows as a type of its own
-            out += std::to_string(t->ekind());
-            break;
+    for (t = t->real;; t = t->component()->real) {
+        switch (t->kind) {
+        case TYPE::tpk_pointer: out += 'P'; continue;
+        case TYPE::tpk_ref: out += 'R'; continue;
+        case TYPE::tpk_complex: out += 'C'; continue;
+        case TYPE::tpk_array: out += (t->is_vector() ? "Dv" : "A") + std::to_string(t->num_elem()) + "_"; continue;
+        case TYPE::tpk_func: out += 'F'; continue;
+        case TYPE::tpk_fixed: out += 'Q'; continue;
+        case TYPE::tpk_ptm: out += 'M'; continue;
+        case TYPE::tpk_void: out += 'v'; return;
+        case TYPE::tpk_int: out += t->is_plain_char() ? 'c' : ints[t->ikind()]; return;
+        case TYPE::tpk_float: out += floats[t->fkind()]; return;
+        default: out += std::to_string(t->name().size()) + t->name(); return;
         }
-        append_code(out, t->component());
-        break;
-    default: out += std::to_string(t->name().size()) + t->name(); break;
     }
 }
 

@@ -169,6 +169,11 @@ static bool both_classes(const TYPE* a, const TYPE* b) {
     return is_class(a) && is_class(b);
 }
 
+static bool params_compatible(const fkPARAM* a, const fkPARAM* b, TYPE_PAIRS& pairs) {
+    for (; a && b; a = a->next, b = b->next) pairs.add(a->type, b->type);
+    return !a && !b;
+}
+
 static bool nodes_compatible(const TYPE* a, const TYPE* b, TYPE_PAIRS& pairs) {
     if (a->kind != b->kind && !both_classes(a, b)) return false;
     switch (a->kind) {
@@ -199,7 +204,7 @@ static bool nodes_compatible(const TYPE* a, const TYPE* b, TYPE_PAIRS& pairs) {
         break;
     case TYPE::tpk_func:
         if (!pairs.first_visit(a, b)) return true;
-        if ((a->cpp || b->cpp) && !params_alike(a->params(), b->params(), pairs)) return false;
+        if ((a->cpp || b->cpp) && !params_compatible(a->params(), b->params(), pairs)) return false;
         break;
     case TYPE::tpk_enum: return a->name() == b->name();
     case TYPE::tpk_class:

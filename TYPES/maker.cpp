@@ -5,6 +5,8 @@
 #include "TYPES/type_impl.h"
 #include "UTIL/abort.h"
 
+#include <algorithm>
+
 static const uint32_t pointer_bits = 32;
 
 // An unknown object size is as large as sizes go, so that it fits nowhere.
@@ -232,8 +234,9 @@ TYPE* TYPE_PKG::mk_struct_vector(TYPE* elem, uint32_t n) {
     if (!elem || !elem->is_scalar()) tp_die("Bad type:  TYPE_PKG::mk_struct_vector()");
     uint64_t stride = stride_of(elem), size = times(this, stride, n);
     if (size > INT32_MAX) tp_die("Bad size:  TYPE_PKG::mk_struct_vector()");
-    TYPE* t = mk_csu(TYPE::tpk_struct, elem->printstr() + std::to_string(n) + "_t", true, false, size, elem->align,
-                     false, true);
+    std::string tag = elem->printstr() + std::to_string(n) + "_t";
+    std::replace(tag.begin(), tag.end(), ' ', '_');
+    TYPE* t = mk_csu(TYPE::tpk_struct, tag, true, false, size, elem->align, false, true);
     fkMDATA* list = nullptr;
     {
         std::lock_guard<std::recursive_mutex> hold(mdata_lock);

@@ -10,9 +10,10 @@
 
 bool TYPE_MERGE_OPTS::is_redefinition_m = false;
 
-// Candidates that a type is compared with. A program has a handful of types of one name; thousands of tagless ones are
-// not worth comparing each with each, and to leave equal types apart is always sound.
-static const int max_candidates = 500;
+// Types that a type is compared with, and those that are looked at to find them. A program has a handful of types of
+// one name; thousands of tagless ones are not worth comparing each with each, and to leave equal types apart is always
+// sound.
+static const size_t max_candidates = 50, max_looked_at = 1000;
 
 TYPE* find_type(TYPE* t) {
     while (t->equiv) t = t->equiv;
@@ -164,7 +165,7 @@ bool TYPE::set_equiv(TYPE* other) {
     bool other_newer = other->tu > from->tu || (other->tu == from->tu && other->uid > from->uid);
     if (other_newer || from->refd || from->writ) return false;
     TYPE* base = base_type(from);
-    if (find_type(base) != find_type(base_type(other))) return false;
+    if (base != base_type(other)) return false;
     if (other->size == 0 && from->size != 0) {
         other->size = from->size;
         other->align = from->align;
@@ -174,23 +175,37 @@ bool TYPE::set_equiv(TYPE* other) {
     merged.splice(merged.end(), list->second, from->place_m);
     if (list->second.empty()) base->based.erase(list);
     from->map_name = "__merged";
-    from->uid = other->uid;
-    __atomic_store_n(&from->equiv, other, __ATOMIC_RELEASE);
+    link_types(from, other);
     return true;
+}
+
+// A look at sizes and members alone, which tells most different types apart without a walk.
+static bool may_be_equal(const TYPE* a, const TYPE* b) {
+    if (a->kind != b->kind || (a->kind < TYPE::tpk_func && a->size != b->size)) return false;
+    if (!a->get_csu() || !a->mdata() || !b->mdata()) return true;
+    const fkMDATA *m = a->mdata(), *n = b->mdata();
+    for (; m && n; m = m->next, n = n->next) {
+        if (m->offset != n->offset || m->type->kind != n->type->kind) return false;
+        if (m->type->kind < TYPE::tpk_func && m->type->size != n->type->size) return false;
+    }
+    return !m && !n;
 }
 
 bool find_equivalent_type(TYPE* t) {
     std::lock_guard<std::recursive_mutex> hold(rt_lock);
     if (t->equiv || t->merg || !t->uid) return t->equiv != nullptr;
     t->merg = true;
-    TYPE* base = find_type(base_type(t));
+    TYPE* base = base_type(t);
     auto list = base->based.find(map_name(t));
     if (list == base->based.end()) return false;
-    int tried = 0;
-    for (auto it = list->second.begin(); it != list->second.end() && tried < max_candidates; ++tried) {
-        TYPE* candidate = *it++;   // merging moves only the newer, `t` or parts of it
-        if (candidate == t) break; // those behind it are newer
-        if (candidate->kind == t->kind && merge_types(t, candidate) && t->equiv) return true;
+    std::vector<TYPE*> candidates; // merging changes the list
+    size_t looked_at = 0;
+    for (TYPE* c : list->second) {
+        if (c == t || ++looked_at > max_looked_at || candidates.size() == max_candidates)
+            break; // those behind `t` are newer
+        if (may_be_equal(c, t)) candidates.push_back(c);
     }
+    for (TYPE* c : candidates)
+        if (merge_types(t, c) && t->equiv) return true;
     return false;
 }

@@ -34,7 +34,7 @@ TYPE* base_type(TYPE* t) {
     case TYPE::tpk_ref:
     case TYPE::tpk_qual:
     case TYPE::tpk_array:
-    case TYPE::tpk_func: return t->component();
+    case TYPE::tpk_func: return find_type(t->component());
     default: return TYPE_PKG::root_type;
     }
 }
@@ -105,7 +105,7 @@ uint64_t TYPE::shape_hash() const {
     case tpk_qual: return mix_hash(h, qual_m);
     case tpk_typedef: return mix_hash(mix_hash(h, type_is_tagless(this) ? 0 : text(name_m)), lowered_m);
     case tpk_array: return mix_hash(h, num_elem_m * uint64_t{4} + complete_m * 2u + vector_m);
-    case tpk_ptm: return mix_hash(h, target2_m->shape_m);
+    case tpk_ptm: return mix_hash(h, target2_m ? target2_m->shape_m : 0); // set after the node is made
     case tpk_func:
         h = mix_hash(h, cc_m * uint64_t{4} + vararg_m * 2u + proto_m);
         for (fkPARAM* p = params_m; p; p = p->next) h = mix_hash(mix_hash(h, p->type->shape_m), p->word * 2 + p->flag);
@@ -145,6 +145,17 @@ TYPE* TYPE_PKG::find_equal(const TYPE* t, uint64_t key) const {
     return found;
 }
 
+// What hangs from a linked type hangs from the one that it became.
+void link_types(TYPE* from, TYPE* to) {
+    for (auto& names : from->based) {
+        std::list<TYPE*>& list = to->based[names.first];
+        list.splice(list.end(), names.second);
+    }
+    from->based.clear();
+    from->uid = to->uid;
+    __atomic_store_n(&from->equiv, to, __ATOMIC_RELEASE);
+}
+
 TYPE* TYPE_PKG::register_type(TYPE* t, TYPE* base) {
     if (t->uid) return t;
     t->tu = current_tu;
@@ -156,8 +167,7 @@ TYPE* TYPE_PKG::register_type(TYPE* t, TYPE* base) {
         if (TYPE* other = find_equal(t, key)) {
             if (t->kind == TYPE::tpk_func) {
                 // It was open, so that a type may have been built on it.
-                t->equiv = other;
-                t->uid = other->uid;
+                link_types(t, other);
             } else {
                 destroy(t);
             }

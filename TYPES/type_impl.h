@@ -41,6 +41,9 @@ private:
     std::set<PAIR> seen_m; // membership only, its order decides nothing
 };
 
+// Makes `from` stand for `to`, for good. The caller has taken it from its base's list and holds rt_lock.
+void link_types(TYPE* from, TYPE* to);
+
 // Compares everything of two extras records but the types in them, which go to `pairs`.
 bool csu_extras_alike(const CSU_EXTRAS* a, const CSU_EXTRAS* b, TYPE_PAIRS& pairs);
 bool params_alike(const fkPARAM* a, const fkPARAM* b, TYPE_PAIRS& pairs);

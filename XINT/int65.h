@@ -1,7 +1,8 @@
 // INT65: a 65-bit integer, from -2^64 to 2^64 - 1, so that every signed and unsigned 64-bit value of the target fits.
 //
-// The workhorse of all integer reasoning: constants, bounds, steps, ranges. Plain arithmetic wraps in the top word without
-// a word; `long_add`, `long_multiply`, `sum_may_overflow` and `prod_may_overflow` are the forms to use where it matters.
+// The workhorse of all integer reasoning: constants, bounds, steps, ranges. Plain arithmetic wraps in the top word
+// without a word; `long_add`, `long_multiply`, `sum_may_overflow` and `prod_may_overflow` are the forms to use where it
+// matters.
 #pragma once
 
 #include "UTIL/abort.h"
@@ -27,15 +28,19 @@ public:
     constexpr bool is_zero() const { return sign == 0 && value == 0; }
 
     // Whether the value is representable in the host type T.
-    template <class T> constexpr bool fits() const {
+    template <class T>
+    constexpr bool fits() const {
         if constexpr (std::is_signed_v<T>)
-            return is_negative() ? sign == -1 && value >> 63 && static_cast<int64_t>(value) >= std::numeric_limits<T>::min()
-                                 : sign == 0 && value <= static_cast<uint64_t>(std::numeric_limits<T>::max());
+            return is_negative()
+                       ? sign == -1 && value >> 63 && static_cast<int64_t>(value) >= std::numeric_limits<T>::min()
+                       : sign == 0 && value <= static_cast<uint64_t>(std::numeric_limits<T>::max());
         else
             return sign == 0 && value <= std::numeric_limits<T>::max();
     }
-    // The value as T. One that does not fit is an assertion failure: the caller asks `fits` first where that isn't known.
-    template <class T> T fits_in() const {
+    // The value as T. One that does not fit is an assertion failure: the caller asks `fits` first where that isn't
+    // known.
+    template <class T>
+    T fits_in() const {
         if (!fits<T>()) optassert("fits_in<T>()", __FILE__, __LINE__);
         return static_cast<T>(value);
     }
@@ -59,22 +64,23 @@ INT65 operator|(INT65 a, INT65 b);
 INT65 operator^(INT65 a, INT65 b);
 INT65 operator~(INT65 a);
 INT65 operator<<(INT65 a, INT65 n); // n of 0 gives a, above 64 gives 0, negative n shifts right
-INT65 operator>>(INT65 a, INT65 n); // arithmetic; negative n shifts left
+INT65 operator>>(INT65 a, INT65 n); // arithmetic, for any n; negative n shifts left
 inline INT65& operator+=(INT65& a, INT65 b) { return a = a + b; }
 inline INT65& operator-=(INT65& a, INT65 b) { return a = a - b; }
 
 // ---- Values of target types. A pointer counts as `long`; sizes in bits.
-INT65 type_mask(const TYPE* type);               // (1 << size) - 1; sizes of 0, 64 and above give 64 ones
-INT65 truncate_to_type(INT65 v, TYPE* type);     // wrapped into an integer, enum, pointer or vector-of-integer type
+INT65 type_mask(const TYPE* type);           // (1 << size) - 1; sizes of 0, 64 and above give 64 ones
+INT65 truncate_to_type(INT65 v, TYPE* type); // wrapped into an integer, enum, pointer or vector-of-integer type
 INT65 sign_extend_by_type(INT65 v, TYPE* type);
 INT65 sign_extend_by_type_size(INT65 v, TYPE* type);
 INT65 int_type_min(TYPE* type);
 INT65 int_type_max(TYPE* type);
-TYPE* default_ICON_type(INT65 v, int flag);      // smallest C type for a constant; `flag` non-zero: unsigned types allowed
-int power_of_2(INT65 v);                         // k with v = 2^k, else -1
-int extract_power_of_2_factor(INT65 v);          // trailing zero bits of a nonzero v
+TYPE* default_ICON_type(INT65 v, int flag); // smallest C type for a constant; `flag` non-zero: unsigned types allowed
+int power_of_2(INT65 v);                    // k with v = 2^k, else -1
+int extract_power_of_2_factor(INT65 v);     // trailing zero bits of a nonzero v
 
-// Text in one of 8 static slots of 31 bytes chosen by `slot` modulo 8; valid until the slot is used again. `radix` 0 chooses.
+// Text in one of 8 static slots of 31 bytes chosen by `slot` modulo 8; valid until the slot is used again. `radix` 0
+// chooses.
 const char* int2text(INT65 v, const TYPE* type, int radix, int slot);
 
 // `*overflow` is set to 1 where the result does not stand for the true value, and never cleared.

@@ -36,7 +36,7 @@ void XI_itox(int32_t v, uint8_t* r);
 void XI_llitox(int64_t v, uint8_t* r);
 void XI_utox(uint32_t v, uint8_t* r);
 void XI_llutox(uint64_t v, uint8_t* r);
-int32_t XI_xtoi(const uint8_t* a);    // low bits
+int32_t XI_xtoi(const uint8_t* a); // low bits
 int64_t XI_xtolli(const uint8_t* a);
 uint32_t XI_xtou(const uint8_t* a);
 uint64_t XI_xtollu(const uint8_t* a);

@@ -1,0 +1,185 @@
+// The target model.
+
+#include "OPT5/target/target.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+
+#include <cstdio>
+
+int float_support;
+bool is_fpu64;
+
+const int32_t target_memref[EKINDS][4] = {
+    {},  {},  {},  {}, {}, {}, // bool to unsigned short: accessed as int
+    {1}, {1},                  // int, unsigned
+    {2}, {2},                  // long, unsigned long
+    {4}, {4},                  // long long, unsigned long long
+    {2}, {},  {4},             // float, double (by its width one of its neighbours), long double
+};
+
+static int stack_variable_count;
+
+// ---- Start-up
+static void read_float_option() {
+    constexpr int id = option_obj::OO_float_support;
+    if (!file_options || !file_options->getopt(id)) return;
+    switch (file_options->getnumarg(id)) {
+    case option_obj::OV_FLOAT_SUPPORT_FPU64: is_fpu64 = true; [[fallthrough]];
+    case option_obj::OV_FLOAT_SUPPORT_FPU32: float_support = static_cast<int>(file_options->getnumarg(id)); break;
+    case option_obj::OV_FLOAT_SUPPORT_SOFTLIB: break;
+    default: {
+        const char* word = file_options->getstrarg(id);
+        printf("\n>>>> Warning: unrecognized option:'--float_support=%s'\n\n", word ? word : "");
+    }
+    }
+}
+
+void init_target() {
+    float_support = 0;
+    is_fpu64 = false;
+    if (cpu_version == -1) cpu_version = 28;
+    if (cpu_version != 27 && cpu_version != 28) {
+        printf("\n>>>> Warning: unrecognized option: '-v%d'\n\n", cpu_version);
+        cpu_version = 28;
+    }
+    TYPE_PKG::cpu_version = cpu_version;
+    if (cpu_version == 27) {
+        rtc_RPT_ok_for_loop = false;
+        return;
+    }
+    rtc_RPT_ok_for_loop = rtc_unified_memory && !rtc_no_rpt_ins();
+    read_float_option();
+}
+
+bool target_is_this_version(const char*) { return true; }
+bool target_is_superset_of_target(const char*, const char*) { return false; }
+bool reserve_global_register(const char*) { return false; }
+
+int init_reg_defs() {
+    stack_variable_count = 0;
+    return 0;
+}
+
+// ---- Questions about trees
+bool leaf_is_immediate(const NODE* t) { return t->op == ICON; }
+bool offset_is_in_range(INT65 offset, const TYPE*, int) { return !offset.is_negative() && offset <= INT65(32767); }
+
+NODE* cpu_bit_test_subtree(NODE* t) {
+    bool is_test = t->op == EQ || t->op == NEQ || t->op == LT || t->op == GE || t->op == GT;
+    if (is_test && t->right->op == ICON && t->right->u.lval.is_zero()) t = t->left;
+    if (t->op != ANDB || t->right->op != ICON || power_of_2(t->right->u.lval) < 0) return t;
+    return t->type->size <= tp->int_t->size ? t->left : t;
+}
+
+long cost_for_DIV_to_MULT_expr(const NODE* t) {
+    constexpr long COST_OF_DIV = 666;
+    long cost = 0;
+    for (; t; t = t->left) cost += (t->op == DIV ? COST_OF_DIV : 1) + cost_for_DIV_to_MULT_expr(t->right);
+    return cost;
+}
+
+// ---- Preparation of register assignment
+SYMTAB* sort_stack_variables(SYMTAB* list) {
+    for (SYMTAB* sym = list; sym; sym = sym->next) {
+        if (sym->is_aliased() || sym->level != 2 || sym->sclass != SC_AUTO || type_may_contain_volatile(sym->type))
+            continue;
+        if (!sym->type->is_scalar() && !sym->type->is_csu()) continue;
+        sym->sclass = SC_REGISTER2;
+        sym->value = static_cast<uint32_t>(stack_variable_count++);
+    }
+    return list;
+}
+
+namespace {
+
+NODE* address_of_indirection(NODE* t) {
+    NODE* indirection = t->left;
+    NODE* address = coerce_to_type(t->type, indirection->left);
+    erase_node(indirection);
+    erase_node(t);
+    return address;
+}
+
+// &x.f is &x and the offsets of the members.
+NODE* address_of_member(NODE* t) {
+    INT65 offset;
+    NODE* base = t->left;
+    for (; base->op == STDOT; base = base->left) {
+        if (!base->right || !base->right->mval || base->right->mval->is_bitfld) return t;
+        offset += INT65(base->right->mval->offset >> 4);
+    }
+    if (!offset_is_in_range(offset, t->type, 0) || (base->op != NAME && base->op != UMULT) || base->right) return t;
+    while (t->left != base) {
+        NODE* member = t->left;
+        t->left = member->left;
+        erase_tree(member->right);
+        erase_node(member);
+    }
+    TYPE* type = t->type;
+    t->type = tp->mk_ptr(base->type);
+    NODE* address = coerce_to_type(type, base->op == UMULT ? address_of_indirection(t) : t);
+    return offset.is_zero() ? address : maketree(PLUS, address, mk_ICON(offset, tp->long_t), type, address->ls);
+}
+
+NODE* lower_address(NODE* t) {
+    if (t->op == STREF && t->left->type->is_pointer()) {
+        t->op = STDOT;
+        t->left = maketree(UMULT, t->left, nullptr, t->left->type->type_pointed_to(), t->ls);
+    }
+    if (t->op != UAND || !t->type->is_pointer()) return t;
+    if (t->left->op == UMULT && !t->left->right) return address_of_indirection(t);
+    if (t->left->op == STDOT && !must_preserve_STDOT(t->left)) return address_of_member(t);
+    return t;
+}
+
+} // namespace
+
+void allocate_regs() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* stmt = bb->statements; stmt; stmt = stmt->rest)
+            stmt->first = rewrite_tree(stmt->first, lower_address);
+    sym_split(currfuninfo);
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'allocate_regs' ----------\n");
+    init_reg_defs();
+    sort_stack_variables(currfuninfo->new_syms);
+    sort_stack_variables(currfuninfo->scalar_syms);
+    wrapup_allocation();
+}
+
+// ---- Hooks
+void find_target_conflicts(NODE*, BITVEC*, BITVEC*, long) {}
+void mark_live_across_call(BITVEC*, NODE*) {}
+void target_lra_uses(NODE*, BITVEC*) {}
+void target_lra_defs(NODE*, BITVEC*) {}
+void mark_outgoing_arg_vars(NODE*) {}
+void copy_reg_preferences(SYMTAB*, unsigned long, SYMTAB*, unsigned long) {}
+void wrapup_allocation() {}
+bool op_affects_RPTB_regs(const NODE*) { return false; }
+
+constexpr uint32_t REGISTER_NUMBERS = 64;
+
+void add_reg_to_set(const SYMTAB* sym, BITVEC* set) {
+    if (sym->value >= REGISTER_NUMBERS) return;
+    if (sym->value >= set->bits) {
+        bv_warn("Index beyond size:add");
+        uint32_t old = set->bits;
+        bv_resize(*set, sym->value + 1);
+        for (uint32_t i = old; i < set->bits; ++i) set->clear(i);
+    }
+    set->set(sym->value);
+}
+
+void remove_reg_from_set(const SYMTAB* sym, BITVEC* set) {
+    if (sym->value >= REGISTER_NUMBERS) return;
+    if (sym->value >= set->bits) {
+        bv_warn("Index beyond size:remove");
+        uint32_t old = set->bits;
+        bv_resize(*set, sym->value + 1);
+        for (uint32_t i = old; i < set->bits; ++i) set->clear(i);
+    }
+    set->clear(sym->value);
+}

@@ -27,7 +27,7 @@ FILE* output_stream = nullptr; // until the I_FILE takes it over
 
 // Writing a file that another one of the run lives in would destroy both.
 void refuse_same_file(const std::string& name, const std::string& other, const char* other_role) {
-    if (other.empty() || !is_same_file(name, other)) return;
+    if (other.empty() || (name != other && !is_same_file(name, other))) return;
     std::fprintf(stderr, "zopt: %s: would overwrite the %s file\n", name.c_str(), other_role);
     std::exit(1);
 }
@@ -74,6 +74,7 @@ void open_info_file() {
     const char* const given = file_options->getstrarg(option_obj::OO_opt_info_filename);
     info_name = given ? given : replace_extension(i_file_name, ".nfo");
     refuse_same_file(info_name, i_file_name, "input");
+    refuse_same_file(info_name, o_file_name, "output");
     finfo = std::fopen(info_name.c_str(), "w");
     if (!finfo) cannot_open("Info", info_name);
     print_toolversion(finfo);
@@ -134,7 +135,7 @@ void open_debug_file(int fatal, const char* suffix, const char* mode) {
     if (!suffix && fdebug) return;
     const std::string name = debug_file_name(i_file_name, suffix);
     if (fdebug) debug_printf(">>>> SWITCHING LOG TO %s\n", name.c_str());
-    const bool overwrites = is_same_file(name, i_file_name) || (o_file && is_same_file(name, o_file_name));
+    const bool overwrites = is_same_file(name, i_file_name) || name == o_file_name || is_same_file(name, o_file_name);
     if (overwrites) errno = EEXIST;
     FILE* const stream = overwrites ? nullptr : std::fopen(name.c_str(), mode ? mode : "w");
     if (!stream) {

@@ -1,0 +1,129 @@
+#include "run.h"
+
+#include "OPT5/driver/driver.h"
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <sys/wait.h>
+#include <unistd.h>
+
+namespace {
+
+std::string number(uint64_t n) {
+    std::string bytes;
+    do {
+        bytes += static_cast<char>((n & 0x7F) | (n > 0x7F ? 0x80 : 0));
+        n >>= 7;
+    } while (n);
+    return bytes;
+}
+
+std::string word32(uint32_t n) {
+    std::string bytes;
+    for (int i = 0; i < 4; ++i) bytes += static_cast<char>(n >> (8 * i) & 0xFF);
+    return bytes;
+}
+
+std::string text(const std::string& s) { return s + '\0'; }
+std::string record(int kind, const std::string& payload) {
+    return static_cast<char>(kind) + number(payload.size()) + payload;
+}
+std::string bytes(std::initializer_list<int> list) { return std::string(list.begin(), list.end()); }
+
+constexpr int POSITION[] = {1, 1, 1};
+const std::string at = bytes({POSITION[0], POSITION[1], POSITION[2]});
+const std::string end(1, '\xFF');
+
+std::string body() {
+    return record(1, at + bytes({0})) + record(5, at) + record(6, at) +
+           record(46, bytes({1, 2, 3})) + // line 2, column 3
+           record(101, bytes({36, 1})) + record(101, bytes({2, 3, 0, 0})) + record(101, bytes({4, 1, 7})) +
+           record(2, at);
+}
+
+// 1: int, 2: void, 3: function returning int.
+std::string types() {
+    return record(116, bytes({1, 6, 0, 16, 16, 0, 0})) + record(116, bytes({2, '1'})) +
+           record(116, bytes({3, 20, 1, 0, 0, 0, 0})) + record(116, bytes({3, 0xFE, 0})) +
+           record(116, bytes({3, 0xFF, 0}));
+}
+
+} // namespace
+
+std::string unit(const OPTION_SETS& sets, bool with_main) {
+    const std::string source = text("unit.c");
+    const uint32_t start = 47;
+    std::string options;
+    for (const auto& [id, words] : sets) {
+        std::string payload = number(id) + number(words.size());
+        for (const std::string& word : words) payload += text(word);
+        options += record(111, payload);
+    }
+    const std::string main_symbol =
+        record(35, text("_main") + bytes({32, 0, 2, 0, 0, 3, 3, 32, 0, static_cast<int>(start), 0}) + at + bytes({0}));
+    std::string rest = (with_main ? body() : "") + end;
+    uint32_t offsets[5] = {};
+    const auto section = [&](int which, const std::string& content) {
+        offsets[which] = start + static_cast<uint32_t>(rest.size());
+        rest += content + end;
+    };
+    if (!sets.empty()) section(0, options);
+    section(2, with_main ? types() : "");
+    section(3, record(126, source));
+    section(4, with_main ? main_symbol : "");
+    std::string header = text("!<icode>\n") + bytes({0xB9, 0xFF, 0x58, 0x02});
+    for (uint32_t offset : offsets) header += word32(offset);
+    return record(8, header + source + word32(0)) + rest;
+}
+
+WORKPLACE::WORKPLACE() {
+    char name[] = "/tmp/zoptXXXXXX";
+    dir = mkdtemp(name);
+}
+WORKPLACE::~WORKPLACE() {
+    std::error_code ignored;
+    std::filesystem::remove_all(dir, ignored);
+}
+
+void WORKPLACE::put(const std::string& name, const std::string& content) const {
+    std::ofstream(dir + "/" + name, std::ios::binary) << content;
+}
+
+std::string WORKPLACE::get(const std::string& name) const {
+    std::stringstream content;
+    content << std::ifstream(dir + "/" + name, std::ios::binary).rdbuf();
+    return content.str();
+}
+
+bool WORKPLACE::has(const std::string& name) const { return access((dir + "/" + name).c_str(), F_OK) == 0; }
+
+RESULT WORKPLACE::run(const std::vector<std::string>& words,
+                      const std::map<std::string, std::string>& environment) const {
+    std::fflush(nullptr);
+    const pid_t child = fork();
+    if (child == 0) {
+        unsetenv("FORCED_OPT_PASSES");
+        for (const auto& [name, value] : environment) setenv(name.c_str(), value.c_str(), 1);
+        if (chdir(dir.c_str()) != 0 || !std::freopen("stdout.txt", "w", stdout) ||
+            !std::freopen("stderr.txt", "w", stderr))
+            std::_Exit(99);
+        std::setvbuf(stderr, nullptr, _IONBF, 0);
+        std::vector<char*> argv;
+        std::string program = "zopt";
+        argv.push_back(program.data());
+        std::vector<std::string> copies = words;
+        for (std::string& word : copies) argv.push_back(word.data());
+        argv.push_back(nullptr);
+        std::exit(zopt_main(static_cast<int>(argv.size()) - 1, argv.data()));
+    }
+    RESULT result;
+    int status = 0;
+    waitpid(child, &status, 0);
+    result.status = WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status);
+    result.out = get("stdout.txt");
+    result.err = get("stderr.txt");
+    for (const char* name : {"/stdout.txt", "/stderr.txt"}) unlink((dir + name).c_str());
+    return result;
+}

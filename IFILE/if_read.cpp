@@ -196,32 +196,38 @@ void I_FILE::if_skip_func() {
     level = 0;
 }
 
+namespace {
+// Kinds 33, 43, 60 and 62 are of other tools; they are well framed all the same.
+bool is_framed_kind(int kind) {
+    return std::strcmp(if_record_name(kind), "unknown") != 0 || kind == 33 || kind == 43 || kind == 60 || kind == 62;
+}
+} // namespace
+
 int I_FILE::if_check_lengths() {
     struct PLACE {
         int at = 0, kind = 0, size = 0;
     } here, before;
     const uint8_t* back = cursor;
+    limit = image_end;
     cursor = image.get();
     for (;;) {
         before = here;
-        here = {static_cast<int>(cursor - image.get()), cursor == image_end ? 0 : *cursor, 0};
-        bool known = false;
+        record = cursor;
+        here = {static_cast<int>(cursor - image.get()), 0, 0};
+        uint64_t size = UINT64_MAX;
         try {
-            int kind = i_read_header();
-            here.size = static_cast<int>(rest());
-            if (kind == IFR_END) break;
-            // Kinds 33, 43, 60 and 62 are of other tools; they are well framed all the same.
-            known = std::strcmp(if_record_name(kind), "unknown") != 0 || kind == 33 || kind == 43 || kind == 60 ||
-                    kind == 62;
-        } catch (const if_error&) {
-            here.size = static_cast<int>(rest());
+            here.kind = i_read_u8();
+            if (here.kind == IFR_END) break;
+            size = i_read_uint();
+        } catch (const if_error&) { // the frame itself is cut short: its size fits nowhere
         }
-        if (!known) {
+        here.size = static_cast<int>(size);
+        if (size > rest() || !is_framed_kind(here.kind)) {
             std::printf(">>I-file error:@%d,id=%d,sz=%d,prev [@%d,id=%d,sz=%d]\n", here.at, here.kind, here.size,
                         before.at, before.kind, before.size);
             return 0;
         }
-        cursor = limit;
+        cursor += size;
     }
     cursor = back;
     return 1;

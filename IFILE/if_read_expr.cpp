@@ -27,7 +27,9 @@ void I_FILE::if_read_expr_field(BASE_NODE* node) {
     if (!member)
         bad_input("FIELD names member %llu of type %llu, which has none of that number",
                   static_cast<unsigned long long>(member_number), static_cast<unsigned long long>(type_number));
-    node->mk_field(kind, member, csu->real);
+    csu = csu->real; // what a typedef names may have been merged too
+    while (csu->equiv) csu = csu->equiv;
+    node->mk_field(kind, member, csu);
 }
 
 // A constant has 32 bits in the file; the type says which way they extend.

@@ -49,12 +49,16 @@ TYPE* I_FILE::find_typeref(uint64_t n) {
     return type;
 }
 
+// Numbers are those of the declaration that is named; the member is the survivor's, where declarations were merged.
 fkMDATA* I_FILE::find_mdataref(uint64_t type_number, uint64_t member_number) {
-    TYPE* type = find_typeref(type_number);
-    if (!type || !type->is_csu()) return nullptr;
-    MEMBER_TABLE& table = member_tables[type_number];
+    if (!find_typeref(type_number)) return nullptr;
+    const TYPE* declared = find_type_info(type_number)->type->real;
+    if (!declared->is_csu()) return nullptr;
+    MEMBER_TABLE& table = member_tables[declared];
     if (!table.filled) {
-        for (fkMDATA* m = type->real->mdata(); m; m = m->next) table.members.push_back(m);
+        const TYPE* survivor = declared;
+        while (survivor->equiv) survivor = survivor->equiv;
+        for (fkMDATA* m = survivor->mdata(); m; m = m->next) table.members.push_back(m);
         table.filled = true;
     }
     size_t place = member_number - 1;
@@ -324,7 +328,7 @@ void I_FILE::tp_end_list(uint64_t n, int list) {
         type_pkg->set_mdata(open.type, std::exchange(open.members, nullptr));
         for (size_t i = 0; i < open.member_numbers.size(); i++)
             if (open.member_numbers[i] != i + 1) {
-                member_tables[n].numbers = std::move(open.member_numbers);
+                member_tables[open.type].numbers = std::move(open.member_numbers);
                 break;
             }
     }

@@ -4,8 +4,8 @@
 #include "UTIL/abort.h"
 
 #include <algorithm>
-#include <utility>
 #include <cstring>
+#include <utility>
 
 const char* PRAGMA::name(unsigned kind) {
     switch (kind) {

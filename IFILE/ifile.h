@@ -240,7 +240,7 @@ private:
     const uint8_t* body = nullptr;   // first byte behind the header
     std::vector<TYPE_INFO> dense_types;
     std::vector<uint64_t> type_order; // numbers of named types in order of reading
-    std::unordered_map<uint64_t, MEMBER_TABLE> member_tables;
+    std::unordered_map<const TYPE*, MEMBER_TABLE> member_tables; // looked up only, never walked
     std::unique_ptr<OPEN_LIST> open_list;
     std::vector<FORWARD_REF> forward_refs;
     size_t waiting_types = 0; // types that still expect lists

@@ -240,6 +240,7 @@ void IC_UNIT::write_item(I_FILE* out, const IC_ITEM& item) {
 
 int IC_UNIT::write(FILE* stream, TYPE_PKG* pkg, bool keep_all_types) {
     I_FILE* out = I_FILE::if_create(stream, pkg, source.c_str());
+    if (file_m) out->extra_word = file_m->extra_word;
     for (const OPTION_SET& set : option_sets) out->if_enter_option_set(set);
     for (IC_SYMBOL* sym : globals) {
         sym->location = 0;

@@ -196,7 +196,7 @@ struct IC_FUNC {
 // The one type package of a tool's run; made on first use.
 TYPE_PKG* ic_type_package();
 
-class IC_UNIT final : public IF_CLIENT {
+class IC_UNIT : public IF_CLIENT {
 public:
     int version = IF_VERSION;
     int cpu = IF_CPU_ID;

@@ -1,0 +1,100 @@
+// Opening: which headers are accepted, and what is said of the others.
+#include "world.h"
+
+namespace {
+std::string why_refused(const std::string& bytes) {
+    WORLD world;
+    return world.read_error(bytes);
+}
+
+TEST(open, header_fields_reach_the_client) {
+    WORLD world;
+    FILE_BUILDER file;
+    file.options = rec(IFR_OPTION_SET, un(3) + un(2) + str("-o2") + str("")) + rec(IFR_OPTION_SET, un(300) + un(0));
+    world.read(file.build());
+    EXPECT_EQ(world.unit.version, -71);
+    EXPECT_EQ(world.unit.cpu, 600);
+    EXPECT_EQ(world.unit.source, "t.c");
+    EXPECT_EQ(world.unit.file()->extra_word, 7);
+    ASSERT_EQ(world.unit.option_sets.size(), 2u);
+    EXPECT_EQ(world.unit.option_sets[0].options, (std::vector<std::string>{"-o2", ""}));
+    EXPECT_EQ(world.unit.option_sets[1].id, 300u);
+}
+
+TEST(open, a_file_that_starts_inside_a_stream) {
+    WORLD world;
+    std::string bytes = "prefix" + FILE_BUILDER().build();
+    FILE* stream = fmemopen(bytes.data(), bytes.size(), "rb");
+    std::fseek(stream, 6, SEEK_SET);
+    world.unit.read(stream, &world.pkg);
+    EXPECT_EQ(world.unit.functions.size(), 1u);
+}
+
+TEST(open, refused_headers) {
+    FILE_BUILDER magic, cpu, longer;
+    magic.magic = "!<ocode>\n";
+    cpu.cpu = 601;
+    longer.tail = "x";
+    std::string good = FILE_BUILDER().build();
+    auto with_offset = [&good](int field, uint32_t offset) {
+        std::string text = good;
+        text.replace(2 + 10 + 4 + 4 * field, 4, little(offset, 4));
+        return text;
+    };
+    const std::pair<std::string, std::string> cases[] = {
+        {"", "file is empty"},
+        {"int main(void) { return 0; }", "first record is of kind 105, not a header"},
+        {magic.build(), "bad magic"},
+        {cpu.build(), "cpu id 601, expected 600"},
+        {FILE_BUILDER(-70).build(), "version -70 is not supported (-86 to -71 are)"},
+        {FILE_BUILDER(-87).build(), "version -87 is not supported (-86 to -71 are)"},
+        {longer.build(), "record of kind 8 (header): its payload ends 1 bytes before its frame"},
+        {good.substr(0, 1), "file ends inside a record"},
+        {good.substr(0, 20), "record of kind 8 (header) runs past the end of the file"},
+        {with_offset(0, 1000000), "the option section's offset 0xf4240 lies past the end of the file"},
+        {with_offset(1, 3), "the initializer section's offset 0x3 lies inside the header"},
+        {with_offset(2, 0xFFFFFFFF), "the type section's offset 0xffffffff lies past the end of the file"},
+        {with_offset(3, 4), "the file name section's offset 0x4 lies inside the header"},
+        {with_offset(4, 0), "there is no global symbol section"},
+        {good.substr(0, 2) + good.substr(2, 10) + little(-71, 2),
+         "record of kind 8 (header) runs past the end of the file"},
+        {by({8, 5}) + "!<ico", "record of kind 8 (header): string without an end"},
+    };
+    for (const auto& [bytes, text] : cases) EXPECT_EQ(why_refused(bytes), text);
+}
+
+// A file may be cut anywhere: the reader says so, and does not crash.
+TEST(open, every_cut_is_reported) {
+    FILE_BUILDER file;
+    file.options = rec(IFR_OPTION_SET, un(1) + un(1) + str("x"));
+    file.files = rec(IFR_FILE_NAME, str("a.c"));
+    file.inits = rec(IFR_INIT, un(1)) + node(4, 1, by({5})) + node(112, 0);
+    file.statements = FILE_BUILDER::expr(node(36, 1) + node(2, 2, by({0, 0})) + node(4, 1, by({1})));
+    std::string whole = file.build();
+    EXPECT_EQ(why_refused(whole), "");
+    for (size_t size = 0; size < whole.size(); size++) EXPECT_NE(why_refused(whole.substr(0, size)), "") << size;
+}
+
+TEST(open, a_client_may_refuse) {
+    struct : IC_UNIT {
+        bool cl_magic(int, int) override { return false; }
+    } refusing;
+    std::string bytes = FILE_BUILDER().build(), why;
+    EXPECT_EQ(I_FILE::if_open(fmemopen(bytes.data(), bytes.size(), "rb"), &refusing, &why), nullptr);
+    EXPECT_EQ(why, "the header is refused");
+}
+
+TEST(open, the_basic_form_reads_the_header_alone) {
+    WORLD world;
+    FILE_BUILDER builder;
+    builder.options = rec(IFR_OPTION_SET, un(1) + un(0));
+    std::string bytes = builder.build();
+    I_FILE* file = I_FILE::if_open_basic(fmemopen(bytes.data(), bytes.size(), "rb"), &world.unit);
+    ASSERT_NE(file, nullptr);
+    EXPECT_EQ(world.unit.source, "");
+    EXPECT_TRUE(world.unit.option_sets.empty());
+    EXPECT_EQ(file->source_name, "t.c");
+    EXPECT_EQ(file->find_typeref(1), nullptr); // no type package yet
+    EXPECT_EQ(I_FILE::if_close(file, false, false), 0);
+}
+} // namespace

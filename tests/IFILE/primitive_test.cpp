@@ -1,0 +1,176 @@
+// The encodings of numbers, positions and frames, seen in the bytes of written records.
+#include "world.h"
+
+#include <unistd.h>
+
+namespace {
+// The bytes that `work` adds behind the header.
+template <class WORK>
+std::string written(WORLD& world, WORK work) {
+    char* bytes = nullptr;
+    size_t size = 0;
+    I_FILE* file = I_FILE::if_create(open_memstream(&bytes, &size), &world.pkg, "t.c");
+    int64_t start = file->if_tell();
+    work(*file);
+    EXPECT_EQ(I_FILE::if_close(file, false, true), 0);
+    std::string text(bytes + start, size - start);
+    std::free(bytes);
+    return text;
+}
+
+TEST(primitives, unsigned_numbers) {
+    WORLD world;
+    const std::pair<uint32_t, std::string> cases[] = {{0, by({0})},
+                                                      {127, by({0x7F})},
+                                                      {128, by({0x80, 1})},
+                                                      {16383, by({0xFF, 0x7F})},
+                                                      {16384, by({0x80, 0x80, 1})},
+                                                      {UINT32_MAX, by({0xFF, 0xFF, 0xFF, 0xFF, 0x0F})}};
+    for (const auto& [value, bytes] : cases)
+        EXPECT_EQ(written(world, [v = value](I_FILE& f) { f.if_write_label(v); }), rec(IFR_LABEL, bytes)) << value;
+}
+
+TEST(primitives, signed_numbers_by_way_of_registers) {
+    const std::pair<int32_t, std::string> cases[] = {{0, by({0})},
+                                                     {-1, by({0x7F})},
+                                                     {63, by({0x3F})},
+                                                     {64, by({0xC0, 0})},
+                                                     {-64, by({0x40})},
+                                                     {-65, by({0xBF, 0x7F})},
+                                                     {INT32_MAX, by({0xFF, 0xFF, 0xFF, 0xFF, 0x07})},
+                                                     {INT32_MIN, by({0x80, 0x80, 0x80, 0x80, 0x78})}};
+    for (const auto& [value, bytes] : cases) {
+        WORLD world;
+        IC_NODE* vreg = world.node(163, nullptr);
+        vreg->mk_vreg(value);
+        EXPECT_EQ(written(world, [&](I_FILE& f) { f.if_write_expr_node(vreg); }), node(163, 0, bytes)) << value;
+        FILE_BUILDER file;
+        file.statements = FILE_BUILDER::expr(node(163, 0, bytes));
+        world.read(file.build());
+        EXPECT_EQ(world.unit.items[3].tree->vreg_id(), value);
+    }
+}
+
+// A reader takes the low 32 bits of whatever is longer, and the last byte of ten may hold more than the one bit.
+TEST(primitives, longer_forms_of_signed_numbers) {
+    const std::pair<std::string, int32_t> cases[] = {
+        {by({0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0x7F}), -1},
+        {by({0xFE, 0xFF, 0xFF, 0xFF, 0x0F}), -2},
+        {by({0x81, 0x80, 0}), 1},
+        {by({0x80, 0x80, 0x80, 0x80, 0x90, 0}), 0}};
+    for (const auto& [bytes, value] : cases) {
+        WORLD world;
+        FILE_BUILDER file;
+        file.statements = FILE_BUILDER::expr(node(163, 0, bytes));
+        world.read(file.build());
+        EXPECT_EQ(world.unit.items[3].tree->vreg_id(), value);
+    }
+}
+
+TEST(primitives, positions) {
+    WORLD world;
+    static const char name[] = "a.c";
+    PSN psn{name, 300, 2}, nameless{nullptr, 1, 1};
+    std::string same_text = "a.c";
+    PSN same{same_text.c_str(), 4, 5};
+    std::string bytes = written(world, [&](I_FILE& f) {
+        f.if_write_end_locals(nullptr);
+        f.if_write_end_locals(&psn);
+        f.if_write_end_locals(&nameless);
+        f.if_write_end_locals(&same);
+        EXPECT_EQ(f.i_get_file_id("a.c"), 1u);
+        EXPECT_EQ(f.i_get_file_id("NO_FILE"), 2u);
+        EXPECT_EQ(f.i_get_file_id("b.c"), 0u);
+        EXPECT_STREQ(f.i_get_file_name(2), "NO_FILE");
+        EXPECT_EQ(f.i_get_file_name(0), nullptr);
+        EXPECT_EQ(f.i_get_file_name(3), nullptr);
+    });
+    EXPECT_EQ(bytes, rec(IFR_END_LOCALS, by({0})) + rec(IFR_END_LOCALS, by({1}) + un(300) + by({2})) +
+                         rec(IFR_END_LOCALS, by({2, 1, 1})) + rec(IFR_END_LOCALS, by({1, 4, 5})));
+}
+
+TEST(primitives, frames_of_every_size) {
+    for (size_t length : {0, 1, 126, 127, 128, 16382, 16383, 40000, 3000000}) {
+        WORLD world;
+        std::string text(length, 'x');
+        EXPECT_EQ(written(world, [&](I_FILE& f) { f.if_write_comment(text.c_str()); }), rec(IFR_COMMENT, str(text)));
+    }
+}
+
+TEST(primitives, levels_follow_the_brackets) {
+    WORLD world;
+    IC_SYMBOL sym;
+    sym.index = 0;
+    written(world, [&](I_FILE& f) {
+        std::vector<int64_t> levels;
+        auto note = [&] { levels.push_back(f.level); };
+        f.if_write_begin_func(&sym, nullptr), note();
+        f.if_write_end_args(nullptr), note();
+        f.if_write_begin_block(nullptr), note();
+        f.if_write_end_locals(nullptr), note();
+        f.if_write_end_block(nullptr), note();
+        f.if_write_end_func(nullptr), note();
+        EXPECT_EQ(levels, (std::vector<int64_t>{1, 2, 3, 3, 2, 0}));
+    });
+    EXPECT_GT(sym.location, 0u);
+}
+
+TEST(primitives, a_discarded_output_has_no_sections) {
+    WORLD world;
+    char* bytes = nullptr;
+    size_t size = 0;
+    I_FILE* file = I_FILE::if_create(open_memstream(&bytes, &size), &world.pkg, "t.c");
+    PSN psn{"a.c", 1, 1};
+    file->if_write_end_locals(&psn);
+    EXPECT_EQ(I_FILE::if_close(file, true, true), 0);
+    EXPECT_EQ(std::string(bytes + 16, 20), std::string(20, '\0'));
+    std::free(bytes);
+}
+
+TEST(primitives, a_stream_that_fails_is_reported_at_the_end) {
+    WORLD world;
+    FILE* full = std::fopen("/dev/full", "wb");
+    ASSERT_NE(full, nullptr);
+    I_FILE* file = I_FILE::if_create(full, &world.pkg, "t.c");
+    EXPECT_EQ(I_FILE::if_close(file, false, false), 1);
+}
+
+TEST(primitives, misuse_ends_the_run) {
+    WORLD world;
+    IC_SYMBOL sym;
+    sym.name = "_lost";
+    IC_NODE* name = world.node(2, nullptr);
+    name->mk_name(&sym);
+    auto quiet = [&](auto work) { written(world, work); };
+    EXPECT_EXIT(quiet([&](I_FILE& f) { dup2(2, 1), f.if_write_expr_node(name); }), testing::ExitedWithCode(1),
+                ">> Symbol _lost is not in the symbol table");
+    EXPECT_EXIT(quiet([&](I_FILE& f) { f.if_write_dep_vector(nullptr, 0, 0, 256); }), testing::ExitedWithCode(1),
+                "!!! DDVECT too big:  256 elements !!!");
+    EXPECT_EXIT((dup2(2, 1), if_enter_node(201, "X", 0)), testing::ExitedWithCode(1),
+                "INTERNAL ERROR: Invalid opcode, aborting");
+}
+
+TEST(tables, opcodes_and_pragma_names) {
+    if_node_table_init();
+    const struct {
+        int op;
+        const char* name;
+        int count;
+    } cases[] = {{0, "NOP", 0},       {1, "LABEL", 0},    {36, "RETURN", 2},   {40, "SWITCH", 2},   {46, "DEFAULT", 1},
+                 {47, "CASE", 2},     {70, "CALL", 2},    {72, "UCALL", 1},    {109, "CBRANCH", 2}, {110, "EPVAL", 1},
+                 {112, "ENDINIT", 0}, {114, "BRANCH", 1}, {118, "URETURN", 1}, {119, "DDNODE", 1},  {130, "UICALL", 0},
+                 {132, "MCALL", 1},   {163, "VREG", 0}};
+    for (const auto& c : cases) {
+        EXPECT_STREQ(if_node_info[c.op].name, c.name);
+        EXPECT_EQ(if_node_info[c.op].operand_count, c.count);
+    }
+    for (int gap : {28, 71, 111, 126, 137, 162}) EXPECT_EQ(if_node_info[gap].name, nullptr) << gap;
+    const std::pair<int, int> relops[] = {{80, 143}, {81, 150}, {82, 145}, {86, 145}, {83, 146}, {87, 146}, {84, 147},
+                                          {88, 147}, {85, 148}, {89, 148}, {79, 79},  {90, 90},  {144, 144}};
+    for (auto [op, becomes] : relops) EXPECT_EQ(if_float_relop(op), becomes);
+    EXPECT_STREQ(PRAGMA::name(3), "FUNC_NEVER_RETURNS");
+    EXPECT_STREQ(PRAGMA::name(69), "COMDAT GROUP");
+    EXPECT_STREQ(PRAGMA::name(128), "NOINLINE");
+    EXPECT_STREQ(PRAGMA::name(129), "unknown");
+}
+} // namespace

@@ -145,10 +145,10 @@ void DIAGNOSTIC::start_new_line() {
 
 // Writes `text` to `stream`, or to `buffer` if one is given, in pieces that fit the line. Returns the characters of the
 // text that were written.
-int DIAGNOSTIC::print_formatted(const char* text, FILE* stream, std::string* buffer, int* cols_left, int cols,
+int DIAGNOSTIC::print_formatted(const char* text, FILE* stream, std::string* buffer, int* cols_left, int diag_cols,
                                 int indent, int wrap_indent) {
-    OPT_ASSERT(cols > indent + wrap_indent);
-    const int full = cols - indent - wrap_indent;
+    OPT_ASSERT(diag_cols > (indent + wrap_indent));
+    const int full = diag_cols - indent - wrap_indent;
     const bool wrap = wrap_enabled_m;
     int written = 0;
     const auto put = [&](const char* piece, int length) {

@@ -9,10 +9,6 @@
 
 namespace {
 constexpr char TAG[] = "opt option debug";
-const char* name_of(int id) {
-    const char* const name = option_obj::option_definitions[id].forms[0];
-    return name ? name : "<internal>";
-}
 } // namespace
 
 option_obj::option_obj(bool) {}
@@ -22,7 +18,7 @@ option_obj::option_obj(bool) {}
 void option_obj::setopt(int id) {
     if (!valid(id)) return;
     ++state[id];
-    if (debug) std::printf("%s: Set    option id %s to state %d\n", TAG, name_of(id), state[id]);
+    if (debug) std::printf("%s: Set    option id %s to state %d\n", TAG, enum_to_optiontxt(id), state[id]);
     if (!no_conflicts) do_conflicts(id);
     add_to_history(id);
 }
@@ -70,7 +66,7 @@ void option_obj::clearopt(int id) {
     ++clear_count[id];
     args[id].clear();
     clear_history(id);
-    if (debug) std::printf("%s: Clear  option id %s to state 0\n", TAG, name_of(id));
+    if (debug) std::printf("%s: Clear  option id %s to state 0\n", TAG, enum_to_optiontxt(id));
 }
 
 // The first argument of an option sets it; later ones replace or extend without another conflict check.
@@ -197,9 +193,8 @@ bool option_obj::export_option(int id, unsigned index, std::string* text) const 
     case PK_STRING:
     case PK_STRING_LIST: *text += arg.word; break;
     case PK_ENUM: {
-        const option_item* item = option_definitions[id].items;
-        while (item->word && item->value != arg.number) ++item;
-        *text += item->word ? item->word : "error";
+        const char* const word = enum_to_enumtxt(static_cast<int>(arg.number));
+        *text += word ? word : "error";
         break;
     }
     default: *text += std::to_string(arg.number);

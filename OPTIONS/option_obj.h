@@ -134,6 +134,9 @@ public:
     static int conflicts(int id, int other);       // 0 none, 1 clears in silence, 2 with a warning, 3 an error
     static int merge_conflicts(int id, int other); // the same between two objects
 
+    static const char* enum_to_optiontxt(int id);  // the primary name, "<internal>" for what is no option word
+    static const char* enum_to_enumtxt(int value); // the word of an item's value, null if there is none
+
     // ---- The program that parses
     static const char* executable_name;
     static const char* (*next_arg)();                                      // next word of the command line, or null
@@ -196,7 +199,7 @@ public:
     std::vector<std::pair<int, std::string>> export_option_pairs(int type, class_id c) const;
     static std::string internal_option_string(int id); // the primary name less its first hyphen
     std::string format_of_option(int id) const;        // the form that the user wrote, or the primary one
-    static std::string help_form_of_option(int id);    // "--name=ARG" and the short forms
+    static std::string get_opt_txt(int id);            // "--name=ARG" and the short forms
 
     // ---- Merging the options of several files
     void merge_init(const option_obj& main_object, const char* file);

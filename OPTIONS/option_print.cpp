@@ -26,7 +26,7 @@ std::string state_text(const option_obj& o, int id, int state) {
 
 } // namespace
 
-std::string option_obj::help_form_of_option(int id) {
+std::string option_obj::get_opt_txt(int id) {
     const option_definition& d = option_definitions[id];
     if (!d.forms[0]) return {};
     std::string text = d.forms[0];
@@ -42,7 +42,7 @@ void option_obj::dump_class(class_id help_class) {
     std::printf("%s:\n", class_descriptions[help_class]);
     for (int id = 0; id < OPTION_COUNT; ++id) {
         if (!option_definitions[id].forms[0] || !isclass(id, help_class)) continue;
-        const std::string form = help_form_of_option(id);
+        const std::string form = get_opt_txt(id);
         std::printf("  %-*s ", HELP_COLUMN - 3, form.c_str());
         if (form.size() > HELP_COLUMN - 3) std::printf("\n%*s", HELP_COLUMN, "");
         std::printf("%s", option_definitions[id].help[0]);
@@ -69,14 +69,11 @@ void option_obj::print() const {
 void option_obj::dump(int all) const {
     for (int id = 0; id < OPTION_COUNT; ++id) {
         if (!all && !getopt(id)) continue;
-        const char* const name = option_definitions[id].forms[0];
-        std::printf("%2d %-30s %s\n", id, name ? name : "<internal>", state_text(*this, id, state[id]).c_str());
+        std::printf("%2d %-30s %s\n", id, enum_to_optiontxt(id), state_text(*this, id, state[id]).c_str());
     }
 }
 
 void option_obj::dump_history() const {
-    for (const event& e : history) {
-        const char* const name = option_definitions[e.id].forms[0];
-        std::printf("%s%s%s\n", name ? name : "<internal>", e.text.empty() ? "" : "=", e.text.c_str());
-    }
+    for (const event& e : history)
+        std::printf("%s%s%s\n", enum_to_optiontxt(e.id), e.text.empty() ? "" : "=", e.text.c_str());
 }

@@ -101,6 +101,26 @@ const char* const option_obj::class_descriptions[CLASS_COUNT] = {
     "Debugging of the optimizer",
 };
 
+const char* option_obj::enum_to_optiontxt(int id) {
+    const char* const name = valid(id) ? option_definitions[id].forms[0] : nullptr;
+    return name ? name : "<internal>";
+}
+
+const char* option_obj::enum_to_enumtxt(int value) {
+    static const option_item all_items[] = {
+#define ITEMLIST(list)
+#define ITEM(list, name, word, value) {word, value},
+#define ITEMLIST_END
+#include "OPTIONS/option_items.def"
+#undef ITEMLIST_END
+#undef ITEM
+#undef ITEMLIST
+    };
+    for (const option_item& item : all_items)
+        if (item.value == value) return item.word;
+    return nullptr;
+}
+
 const char* option_obj::executable_name = "zopt";
 const char* (*option_obj::next_arg)() = nullptr;
 std::map<std::string, std::string> option_obj::tool_cmd_map = {{"optimizer", "zopt"}};

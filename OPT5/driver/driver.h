@@ -9,6 +9,7 @@
 #include "OPTIONS/option_obj.h"
 
 #include <cstdio>
+#include <functional>
 #include <string>
 
 // The whole program, on a stack of its own. Its status is the process's.
@@ -33,8 +34,12 @@ void set_global_flags(option_obj* options);
 void init_fileopts();
 
 // ---- The function loop (run_loop.cpp)
-void run_functions();
+void run_functions(void (*write_function)()); // `write_function`: the action of the last step
 void report_times(long ticks);
+
+// Runs `work` under the rule for failures: bad input becomes a message, every other exception an abnormal end. Returns
+// what `work` does, and only then.
+bool run_guarded(const std::function<bool()>& work);
 
 // ---- Ends (abnormal_end.cpp, signals.cpp)
 void install_abort_behaviour();

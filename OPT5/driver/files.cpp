@@ -20,8 +20,9 @@ register_option pass_debug_help("debug:help");
 std::string info_name, debug_name;
 FILE* output_stream = nullptr; // until the I_FILE takes it over
 
-[[noreturn]] void cannot_open(const char* what, const std::string& name) {
-    std::fprintf(stderr, "\n>> Cannot Open %s File, %s : %s, Aborting\n", what, std::strerror(errno), name.c_str());
+// `format` takes the reason and the name.
+[[noreturn]] void cannot_open(const char* format, const std::string& name) {
+    std::fprintf(stderr, format, std::strerror(errno), name.c_str());
     std::exit(1);
 }
 
@@ -34,7 +35,7 @@ void refuse_same_file(const std::string& name, const std::string& other, const c
 
 void open_input() {
     FILE* const stream = std::fopen(i_file_name.c_str(), "rb");
-    if (!stream) cannot_open("Input icode", i_file_name);
+    if (!stream) cannot_open("\n>> Cannot Open Input icode File, %s : %s, Aborting\n", i_file_name);
     std::string why;
     i_file = I_FILE::if_open(stream, opt_client(), &why);
     if (i_file) return;
@@ -76,7 +77,7 @@ void open_info_file() {
     refuse_same_file(info_name, i_file_name, "input");
     refuse_same_file(info_name, o_file_name, "output");
     finfo = std::fopen(info_name.c_str(), "w");
-    if (!finfo) cannot_open("Info", info_name);
+    if (!finfo) cannot_open("\n>> Cannot Open Info File, %s : %s, Aborting\n", info_name);
     print_toolversion(finfo);
 }
 
@@ -84,7 +85,7 @@ void open_output() {
     refuse_same_file(o_file_name, info_name, "info");
     refuse_same_file(o_file_name, debug_name, "debug");
     output_stream = std::fopen(o_file_name.c_str(), "wb");
-    if (!output_stream) cannot_open("Output icode", o_file_name);
+    if (!output_stream) cannot_open("\n>> Cannot Open Output icode File, %s : %s, Aborting\n", o_file_name);
     o_file = I_FILE::if_create(output_stream, tp, i_file->source_name.c_str());
     for (const OPTION_SET& set : icode_optionlist) o_file->if_enter_option_set(set);
 }

@@ -57,14 +57,14 @@ bool optimize_unit(int argc, char** argv) {
         currfuninfo = nullptr;
         analyze_global_symbols();
     } else {
-        run_functions();
+        run_functions(output_function);
         dump_psnrefs();
     }
     return true;
 }
 
 // What is wrong with the input, and where. A text with its own form stands as it is on a line ahead of the place.
-[[noreturn]] void refuse_input(const std::string& text, long offset) {
+[[noreturn]] void report_bad_input(const std::string& text, long offset) {
     char place[40] = "";
     if (offset >= 0) std::snprintf(place, sizeof place, "offset 0x%lx: ", offset);
     const bool own_form = !text.empty() && (text[0] == '\n' || text.compare(0, 4, "TP>>") == 0);
@@ -72,13 +72,15 @@ bool optimize_unit(int argc, char** argv) {
     fail_run(own_form ? text + (text.back() == '\n' ? "" : "\n") + where + "not an acceptable I-file" : where + text);
 }
 
-bool guarded_optimize_unit(int argc, char** argv) {
+} // namespace
+
+bool run_guarded(const std::function<bool()>& work) {
     try {
-        return optimize_unit(argc, argv);
+        return work();
     } catch (const if_error& e) {
-        refuse_input(e.what(), e.offset());
+        report_bad_input(e.what(), e.offset());
     } catch (const tp_failure& e) {
-        refuse_input(e.what(), -1);
+        report_bad_input(e.what(), -1);
     } catch (const std::bad_alloc&) {
         abort_optimizer("ERROR - OUT OF MEMORY");
     } catch (const std::exception& e) {
@@ -88,6 +90,8 @@ bool guarded_optimize_unit(int argc, char** argv) {
     }
 }
 
+namespace {
+
 void release_types() {
     if (TYPE_PKG::tp_count - 1 == 0) tp->delete_type_tree(TYPE_PKG::root_type, 1, 0);
     delete tp;
@@ -95,13 +99,16 @@ void release_types() {
 }
 
 void run(int argc, char** argv) {
-    if (!guarded_optimize_unit(argc, argv)) {
+    if (!run_guarded([&] { return optimize_unit(argc, argv); })) {
         discard_output();
         std::exit(0);
     }
-    write_end_of_unit();
-    interned_stats();
-    type_cache_stats();
+    run_guarded([] {
+        write_end_of_unit();
+        interned_stats();
+        type_cache_stats();
+        return true;
+    });
     if (print_debug || enable_time_stats) report_times(std::clock() - start_time);
     close_files();
     release_types();

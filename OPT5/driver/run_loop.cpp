@@ -8,7 +8,6 @@
 #include "DECODE/decode.h"
 #include "OPT5/driver/driver.h"
 #include "OPT5/driver/passes.h"
-#include "OPT5/io/write.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symtab.h"
@@ -157,28 +156,28 @@ void advance_to_barrier() {
 }
 
 void run_barrier() {
-    pass* barrier = nullptr;
+    pass* barrier_pass = nullptr;
     for (SYMTAB* f : functions) {
         PASS_LIST& passes = steps_table[f];
         if (passes.empty()) continue;
         OPT_ASSERT(passes.front()->is_barrier());
-        if (!barrier) barrier = passes.front();
-        OPT_ASSERT(barrier == passes.front());
+        if (!barrier_pass) barrier_pass = passes.front();
+        OPT_ASSERT(barrier_pass == passes.front());
         passes.pop_front();
     }
-    if (barrier) barrier->run();
+    if (barrier_pass) barrier_pass->run();
     OPT_ASSERT(unsuppressed_functions.empty());
 }
 
-void prepare_lists() {
-    output_step = new pass("output function", output_function);
-    for (SYMTAB* f : functions) {
-        PASS_LIST& passes = steps_table[f];
-        passes.assign(permuted_order.begin(), permuted_order.end());
-        OPT_ASSERT(passes.size() == permuted_order.size());
+void prepare_lists(void (*write_function)()) {
+    output_step = new pass("output function", write_function);
+    steps_table.clear();
+    for (SYMTAB* sym : functions) {
+        steps_table[sym].assign(permuted_order.begin(), permuted_order.end());
+        OPT_ASSERT(steps_table[sym].size() == permuted_order.size());
         // With workers, writing waits for the end of the loop: so the order of the output is that of the list.
-        if (max_threads == 0) passes.push_back(output_step);
-        if (print_debug) const FUNCTION_LOG empty_log(f, "w");
+        if (max_threads == 0) steps_table[sym].push_back(output_step);
+        if (print_debug) const FUNCTION_LOG empty_log(sym, "w");
     }
     matcher_init();
 }
@@ -206,8 +205,8 @@ void finish_late_functions() {
 
 } // namespace
 
-void run_functions() {
-    prepare_lists();
+void run_functions(void (*write_function)()) {
+    prepare_lists(write_function);
     while (work_remains()) {
         advance_to_barrier();
         run_barrier();

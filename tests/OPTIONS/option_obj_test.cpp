@@ -373,7 +373,7 @@ TEST(OptionHelp, ShowsEveryOptionOnce) {
     const std::string text = testing::internal::GetCapturedStdout();
     for (int id = 0; id < O::OPTION_COUNT; ++id) {
         if (!O::option_definitions[id].forms[0]) continue;
-        const std::string line = "\n  " + O::help_form_of_option(id) + " ";
+        const std::string line = "\n  " + O::get_opt_txt(id) + " ";
         const std::size_t at = text.find(line);
         EXPECT_NE(at, std::string::npos) << line;
         EXPECT_EQ(text.find(line, at + 1), std::string::npos) << line;

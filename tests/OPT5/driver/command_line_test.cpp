@@ -117,7 +117,7 @@ TEST(Files, OutputIsTheSameWhateverIsLogged) {
 
 TEST(Files, UnitWithoutFunctions) {
     WORKPLACE w;
-    w.put("a.if", unit({}, false));
+    w.put("a.if", unit({}, 0));
     const RESULT r = w.run({"a.if", "b.if"});
     EXPECT_EQ(r.status, 0) << r.err;
     w.put("c.if", w.get("b.if"));

@@ -36,11 +36,11 @@ constexpr int POSITION[] = {1, 1, 1};
 const std::string at = bytes({POSITION[0], POSITION[1], POSITION[2]});
 const std::string end(1, '\xFF');
 
-std::string body() {
-    return record(1, at + bytes({0})) + record(5, at) + record(6, at) +
+std::string body(int global) {
+    return record(1, at + number(global)) + record(5, at) + record(6, at) +
            record(46, bytes({1, 2, 3})) + // line 2, column 3
-           record(101, bytes({36, 1})) + record(101, bytes({2, 3, 0, 0})) + record(101, bytes({4, 1, 7})) +
-           record(2, at);
+           record(101, bytes({36, 1})) + record(101, bytes({2, 3, 0}) + number(global)) +
+           record(101, bytes({4, 1, 7})) + record(2, at);
 }
 
 // 1: int, 2: void, 3: function returning int.
@@ -52,27 +52,30 @@ std::string types() {
 
 } // namespace
 
-std::string unit(const OPTION_SETS& sets, bool with_main) {
+std::string unit(const OPTION_SETS& sets, int count) {
     const std::string source = text("unit.c");
     const uint32_t start = 47;
-    std::string options;
+    std::string options, rest, symbols;
     for (const auto& [id, words] : sets) {
         std::string payload = number(id) + number(words.size());
         for (const std::string& word : words) payload += text(word);
         options += record(111, payload);
     }
-    const std::string main_symbol =
-        record(35, text("_main") + bytes({32, 0, 2, 0, 0, 3, 3, 32, 0, static_cast<int>(start), 0}) + at + bytes({0}));
-    std::string rest = (with_main ? body() : "") + end;
+    for (int i = 0; i < count; ++i) {
+        symbols += record(35, text(i == 0 ? "_main" : "_f" + std::to_string(i)) + bytes({32, 0, 2, 0, 0, 3, 3, 32, 0}) +
+                                  number(start + rest.size()) + bytes({0}) + at + bytes({0}));
+        rest += body(i);
+    }
+    rest += end;
     uint32_t offsets[5] = {};
     const auto section = [&](int which, const std::string& content) {
         offsets[which] = start + static_cast<uint32_t>(rest.size());
         rest += content + end;
     };
     if (!sets.empty()) section(0, options);
-    section(2, with_main ? types() : "");
+    section(2, count ? types() : "");
     section(3, record(126, source));
-    section(4, with_main ? main_symbol : "");
+    section(4, symbols);
     std::string header = text("!<icode>\n") + bytes({0xB9, 0xFF, 0x58, 0x02});
     for (uint32_t offset : offsets) header += word32(offset);
     return record(8, header + source + word32(0)) + rest;
@@ -99,8 +102,8 @@ std::string WORKPLACE::get(const std::string& name) const {
 
 bool WORKPLACE::has(const std::string& name) const { return access((dir + "/" + name).c_str(), F_OK) == 0; }
 
-RESULT WORKPLACE::run(const std::vector<std::string>& words,
-                      const std::map<std::string, std::string>& environment) const {
+RESULT WORKPLACE::run(const std::vector<std::string>& words, const std::map<std::string, std::string>& environment,
+                      void (*before)()) const {
     std::fflush(nullptr);
     const pid_t child = fork();
     if (child == 0) {
@@ -116,6 +119,7 @@ RESULT WORKPLACE::run(const std::vector<std::string>& words,
         std::vector<std::string> copies = words;
         for (std::string& word : copies) argv.push_back(word.data());
         argv.push_back(nullptr);
+        if (before) before();
         std::exit(zopt_main(static_cast<int>(argv.size()) - 1, argv.data()));
     }
     RESULT result;

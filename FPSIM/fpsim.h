@@ -1,11 +1,15 @@
 // Target floating point in software. No operation uses the host's floating types for its result, `f_ftoh` excepted.
 //
-// A simul_fval is a base-65536 number of six digits, (mant[0] + mant[1]/65536 + ...) * 2^(exp - 16), with exp a multiple of
-// 16 and mant[0] not 0 (the aligned form, which every operation returns): 81 to 96 significant bits. Zero has exp -32767,
-// infinity exp 32767 with mant[0] 0, NaN exp 32767 with mant[0] not 0.
+// A simul_fval is a base-65536 number of six digits, (mant[0] + mant[1]/65536 + ...) * 2^(exp - 16), with exp a
+// multiple of 16 and mant[0] not 0 (the aligned form, which every operation returns): 81 to 96 significant bits. Zero
+// has exp -32767, infinity exp 32767 with mant[0] 0, NaN exp 32767 with mant[0] not 0.
 //
-// Operations take pointers, and the result may be an operand. They return 0, or a non-zero value when they left a bit in
-// `fp_error`, which only the caller clears.
+// A result that does not fit the digits is rounded to odd: cut off, with the last bit set. Since the digits hold more
+// than two bits beyond a double, rounding such a value to a float or a double of the target gives what rounding the
+// exact result once would give. Rounding to nearest twice would not.
+//
+// Operations take pointers, and the result may be an operand. They return 0, or a non-zero value when they left a bit
+// in `fp_error`, which only the caller clears.
 #pragma once
 
 #include <cstdint>
@@ -33,15 +37,15 @@ struct precise_sim_fval {
 };
 
 enum FP_ERROR { FPE_INVALID = 1, FPE_DIVIDE = 2, FPE_OVER = 4, FPE_UNDER = 8 };
-extern int fp_error;
-extern std::mutex atof_lock; // the text conversion's table and static state
+extern thread_local int fp_error; // of the thread that computes
+extern std::mutex atof_lock;      // held by callers of the text conversions' static buffers
 
-extern const simul_fval pos_zero, neg_zero, pos_infin, neg_infin, a_nan, pos_huge, neg_huge, const_one, const_ten, const_sixteen,
-    const_dig[16], one_q, one_half, three_q, one, neg_one, one_p_five, two, neg_two, four;
+extern const simul_fval pos_zero, neg_zero, pos_infin, neg_infin, a_nan, pos_huge, neg_huge, const_one, const_ten,
+    const_sixteen, const_dig[16], one_q, one_half, three_q, one, neg_one, one_p_five, two, neg_two, four;
 
 // ---- Representation
 int f_align_radix_pt(simul_fval* x);
-int f_left_justify(simul_fval* x);
+int f_left_justify(simul_fval* x); // top bit of mant[0] set, a form for use within the simulator
 int f_rnd_prectbl(const precise_sim_fval* table, simul_fval* out, int n);
 bool f_is_zero(const simul_fval* x);
 bool f_is_nan(const simul_fval* x);

@@ -267,7 +267,7 @@ NODE* make_implicit_state_argument() {
 NODE* cleanup_intrinsic(NODE* t) {
     const BIF* bif = find_BIF_descriptor(t->u.name);
     if (!std::strcmp(t->u.name, "_never_executed") || is_magic_EH_MCALL(t)) return t;
-    if (!bif || bif->flags & BIF_IS_GENERIC) return intrinsic_to_call(t);
+    if (!bif || bif->has(IS_GENERIC)) return intrinsic_to_call(t);
     const bool pure = bif->opcode == ICALL || bif->opcode == UICALL;
     if (pure || tree_contains_op(t, ARGREF)) return t;
     NODE* state = make_implicit_state_argument();

@@ -58,7 +58,7 @@ private:
     void make_ptr_entries(const SYMTAB* outer);
     void close_scope(PSN* psn);
     void apply_function_pragma(SYMTAB* sym, const PRAGMA& pragma);
-    void check_labels();
+    void check_references();
     void add_return_pointer_assertion();
 
     std::vector<SCOPE_RECORD> open_scopes;

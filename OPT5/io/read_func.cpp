@@ -221,29 +221,21 @@ template <class F> void for_each_raw_tree(FUNINFO* f, F&& visit) {
         if (item.cleanup) visit(item.cleanup);
 }
 
-void check_exception_entries(FUNINFO* f) {
-    const size_t size = f->eht.size();
-    for_each_raw_tree(f, [=](NODE* tree) {
-        for_each_node(tree, [=](NODE* t) {
-            if (!op_is_call(t->op)) return;
-            if (size <= 1) t->eh_entry = 0;
-            if (t->eh_entry && t->eh_entry >= size) refuse_input("a call names exception entry " + std::to_string(t->eh_entry));
-        });
-    });
-}
-
 void restate_intrinsics(FUNINFO* f) {
     if (!f->has_cqual10_name) return;
     for_each_raw_tree(f, [](NODE* tree) {
         for_each_node(tree, [](NODE* t) {
-            if (t->op == ICALL && BIF_becomes_MCALL(find_BIF_descriptor(t->u.name))) t->op = MCALL;
+            if (t->op != ICALL) return;
+            const BIF* bif = find_BIF_descriptor(t->u.name);
+            if (bif && bif->has(IS_MCALL_FOR_ONE_STAGE)) t->op = MCALL;
         });
     });
 }
 
 void simplify_raw_statements(FUNINFO* f) {
     for (LIST* s = f->statements; s; s = s->rest) {
-        s->first = rewrite_tree(s->first, [](NODE* t) { return op_is_intrinsic(t->op) ? fix_BIF_types(t) : t; });
+        if (f->has_intrinsics)
+            s->first = rewrite_tree(s->first, [](NODE* t) { return op_is_intrinsic(t->op) ? fix_BIF_types(t) : t; });
         s->first = simp_tree(s->first, nullptr);
     }
 }
@@ -257,18 +249,25 @@ void size_site_sets(FUNINFO* f) {
 
 } // namespace
 
-// Every label that a statement or a catch clause names must be defined in the function.
-void OPT_CLIENT::check_labels() {
-    auto check = [this](int64_t label) {
+// Every label that a statement or a catch clause names must be defined in the function, and every exception entry that a
+// call names must stand in the table. A function without a table has no entries.
+void OPT_CLIENT::check_references() {
+    FUNINFO* f = currfuninfo;
+    const size_t entries = f->eht.size();
+    auto check_label = [this](int64_t label) {
         if (!labels.count(static_cast<uint32_t>(label))) refuse_input("label " + std::to_string(label) + " is not defined");
     };
-    for_each_raw_tree(currfuninfo, [&](NODE* tree) {
+    for_each_raw_tree(f, [&](NODE* tree) {
         for_each_node(tree, [&](NODE* t) {
-            if (t->op == LABELREF && !t->lbl) check(t->u.lval.fits_in<int64_t>());
+            if (t->op == LABELREF && !t->lbl) check_label(t->u.lval.fits_in<int64_t>());
+            if (!op_is_call(t->op)) return;
+            if (entries <= 1) t->eh_entry = 0;
+            if (t->eh_entry && t->eh_entry >= entries)
+                refuse_input("a call names exception entry " + std::to_string(t->eh_entry));
         });
     });
-    for (const EHT_ITEM& item : currfuninfo->eht)
-        for (const EHT_CATCH& c : item.catches) check(c.label);
+    for (const EHT_ITEM& item : f->eht)
+        for (const EHT_CATCH& c : item.catches) check_label(c.label);
 }
 
 // A structure returned through a hidden pointer: the copy of that parameter never changes and is never null.
@@ -311,8 +310,7 @@ void OPT_CLIENT::cl_end_func(PSN* psn) {
     flatten_levels(f);
     count_symbol_indexes(f);
     sym_split(f);
-    check_exception_entries(f);
-    check_labels();
+    check_references();
     lex = 0;
     restate_intrinsics(f);
     simplify_raw_statements(f);

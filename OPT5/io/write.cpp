@@ -123,17 +123,13 @@ template <class F> void for_each_tree(FUNINFO* f, F&& visit) {
         for (LIST* s = bb->statements; s; s = s->rest) visit(s->first);
 }
 
-bool function_makes_calls(FUNINFO* f) {
-    bool calls = false;
-    for_each_tree(f, [&](NODE* tree) {
-        if (!calls) calls = tree_contains_op(tree, CALL) || tree_contains_op(tree, UCALL);
-    });
-    return calls;
-}
-
 } // namespace
 
 // ---- The function
+
+namespace {
+bool calls_are_written = false; // by the function that is written
+}
 
 void write_func_header() {
     for (const std::string& comment : currfuninfo->comments) wrasmr(IFR_COMMENT, comment.c_str(), nullptr);
@@ -181,7 +177,7 @@ void write_func_body() {
     wrstcr(IFR_END_ARGS, f->end_args_psn);
     write_locals(f);
     wrstcr(IFR_END_LOCALS, f->end_locals_psn);
-    if (!function_makes_calls(f)) {
+    if (!calls_are_written) {
         constexpr uint8_t LEAF = 76;
         o_file->if_write_func_info(LEAF);
         debug_printf("%s is a leaf function\n", f->name.c_str());
@@ -201,22 +197,26 @@ void write_func_body() {
 
 namespace {
 
+// One walk over what will be written: which locals it names, and whether it calls. The count of uses stops at 1, since
+// the word is narrow and only zero matters.
+void survey(FUNINFO* f) {
+    for (SYMTAB* list : {f->scalar_syms, f->memory_syms, f->new_syms, f->pending_syms})
+        for (SYMTAB* s = list; s; s = s->next)
+            if (s->level == 2) s->set_bitnum(0);
+    calls_are_written = false;
+    auto visit = [](NODE* t) {
+        if (t->op == NAME && t->u.sym->level == 2)
+            t->u.sym->set_bitnum(1);
+        else if (op_is_call(t->op))
+            calls_are_written = true;
+    };
+    for_each_tree(f, [&](NODE* tree) { for_each_node(tree, visit); });
+    for (EHT_ITEM& item : f->eht) for_each_node(item.cleanup, visit);
+}
+
 // Locals that nothing names any more are not declared to the code generator.
 void drop_unused_locals(FUNINFO* f) {
-    for (SYMTAB** list : {&f->scalar_syms, &f->memory_syms, &f->new_syms, &f->pending_syms})
-        for (SYMTAB* s = *list; s; s = s->next)
-            if (s->level == 2) s->set_bitnum(0);
-    for_each_tree(f, [](NODE* tree) {
-        for_each_node(tree, [](NODE* t) {
-            if (t->op != NAME || t->u.sym->level != 2) return;
-            if (t->u.sym->bitnum() == 0) t->u.sym->inc_bitnum(); // only zero and not zero matter; the word is 16 bits
-        });
-    });
-    for (EHT_ITEM& item : f->eht)
-        if (item.cleanup)
-            for_each_node(item.cleanup, [](NODE* t) {
-                if (t->op == NAME && t->u.sym->level == 2 && t->u.sym->bitnum() == 0) t->u.sym->inc_bitnum();
-            });
+    survey(f);
     for (SYMTAB** list : {&f->scalar_syms, &f->memory_syms, &f->new_syms, &f->pending_syms})
         for (SYMTAB** link = list; *link;) {
             SYMTAB* s = *link;
@@ -247,6 +247,7 @@ NODE* strip_implicit_state(NODE* t) {
 }
 
 void strip_implicit_states(FUNINFO* f) {
+    if (!f->has_intrinsics) return;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
         for (LIST* s = bb->statements; s; s = s->rest) s->first = rewrite_tree(s->first, strip_implicit_state);
     for (EHT_ITEM& item : f->eht) item.cleanup = rewrite_tree(item.cleanup, strip_implicit_state);

@@ -205,8 +205,9 @@ void wrbblocks() {
     FUNINFO* f = currfuninfo;
     initialize_CFG_profiling_annotation(1, 1);
     renumber_bblocks();
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s; s = s->rest) s->first = rewrite_tree(s->first, lower_lane_move);
+    if (f->has_intrinsics)
+        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
+            for (LIST* s = bb->statements; s; s = s->rest) s->first = rewrite_tree(s->first, lower_lane_move);
     if (print_debug && write_opt_info) prbbinfix(finfo);
     empty_unreached_spins(f);
     write_entry_count(f);

@@ -98,7 +98,7 @@ NODE* prepare_node(NODE* t) {
     case ASSERT: return prepare_ASSERT(t);
     case SWITCH: prepare_SWITCH(t); return t;
     case MCALL:
-        if (BIF_becomes_MCALL(find_BIF_descriptor(t->u.name))) t->op = ICALL;
+        if (MCALL_stands_for_ICALL(t)) t->op = ICALL;
         return t;
     case VSCONV:
         OPT_ASSERT(t->type->is_vector() && t->left->type->is_vector());

@@ -192,4 +192,7 @@ void NODE::mk_ucall(uint32_t entry) {
     note_call();
 }
 
-void NODE::mk_icall(const char* name) { u.name = safestrdup(name); }
+void NODE::mk_icall(const char* name) {
+    u.name = safestrdup(name);
+    if (currfuninfo) currfuninfo->has_intrinsics = true;
+}

@@ -12,15 +12,14 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
 
-#include <cstring>
 #include <vector>
 
 namespace {
 
 constexpr int ASM_COMMENT = 47;
-constexpr char EH_DISPATCH[] = "$EH$dispatch";
 
 class SEQUENCER {
 public:
@@ -266,14 +265,14 @@ NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through) {
             cases = cases ? maketree(COMMA, cases, entry, tp->int_t, scope) : entry;
         }
     NODE* dflt = maketree(DEFAULT, fall_through, nullptr, tp->int_t, scope);
-    NODE* sw = maketree(SWITCH, mk_MCALL(EH_DISPATCH, nullptr, tp->int_t), maketree(COMMA, cases, dflt, tp->int_t, scope),
+    NODE* sw = maketree(SWITCH, mk_MCALL(MAGIC_EH_NAME, nullptr, tp->int_t), maketree(COMMA, cases, dflt, tp->int_t, scope),
                         tp->int_t, scope);
     sw->u.lval = INT65(count);
     return sw;
 }
 
 bool tree_is_EH_SWITCH(const NODE* tree) {
-    return tree && tree->op == SWITCH && tree->left && tree->left->op == UMCALL && !std::strcmp(tree->left->u.name, EH_DISPATCH);
+    return tree && tree->op == SWITCH && tree->left && tree->left->op == UMCALL && is_magic_EH_MCALL(tree->left);
 }
 
 void update_eht_labels(NODE* tree, bool negated) {

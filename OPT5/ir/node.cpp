@@ -84,7 +84,7 @@ fkMDATA* NODE::field_mval() const { return mval; }
 TYPE* NODE::field_csu() const { return u.csu; }
 uint32_t NODE::icon_uvalue() const { return u.lval.fits_in<uint32_t>(); }
 int32_t NODE::icon_svalue() const { return u.lval.fits_in<int32_t>(); }
-const char* NODE::lcon_value() const { return int2text(u.lval, type, 10, 0); }
+const char* NODE::lcon_value() const { return int2text(u.lval, nullptr, 10, 0); } // without a type: no suffix
 const char* NODE::scon_value() const { return text; }
 uint32_t NODE::scon_length() const { return u.lval.fits_in<uint32_t>(); }
 // An internal label counts down from -1; in the file it is that number's 32-bit pattern.

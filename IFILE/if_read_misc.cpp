@@ -97,9 +97,7 @@ void I_FILE::if_read_eht_entry(EHT_ENTRY* entry, uint32_t table_size) {
         entry->catches.resize(entry->count);
         for (I_CATCH_ENTRY& clause : entry->catches) {
             clause.type_name = i_read_string();
-            uint64_t label = i_read_uint();
-            if (label > INT32_MAX) bad_input("catch clause at label %llu", static_cast<unsigned long long>(label));
-            clause.label = static_cast<uint32_t>(label);
+            clause.label = static_cast<uint32_t>(i_read_uint());
             clause.flag = i_read_bool();
         }
         end_record();

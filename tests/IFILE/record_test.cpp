@@ -250,6 +250,35 @@ TEST(symbols, locations_name_definitions) {
     EXPECT_EQ(world.unit.globals[1]->init.size(), 2u);
 }
 
+// ---- Graphs
+
+TEST(graphs, edges_of_every_jump) {
+    WORLD world;
+    FILE_BUILDER file;
+    std::string v = node(2, 1, by({0, 1})), one = node(4, 1, by({1}));
+    auto label = [](int n) { return node(1, 0, by({n})); };
+    file.statements = FILE_BUILDER::expr(node(109, 0) + v + label(3)) + FILE_BUILDER::expr(node(114, 0) + label(1)) +
+                      rec(IFR_LABEL, by({3})) +
+                      FILE_BUILDER::expr(node(40, 1, un(1)) + v + node(56, 1) + node(47, 1) + one + label(1) +
+                                         node(46, 1) + label(2)) +
+                      rec(IFR_LABEL, by({1})) + FILE_BUILDER::expr(v) + rec(IFR_LABEL, by({2})) +
+                      FILE_BUILDER::expr(node(118, 0) + node(2, 2, by({0, 0})));
+    world.read(file.build());
+    char* bytes = nullptr;
+    size_t size = 0;
+    FILE* out = open_memstream(&bytes, &size);
+    ic_print_dot(out, world.unit);
+    std::fclose(out);
+    std::string text(bytes, size);
+    std::free(bytes);
+    std::vector<std::string> edges;
+    for (std::smatch m; std::regex_search(text, m, std::regex("f0_(\\w+) -> f0_(\\w+)(?: \\[label=\"(\\w*)\"\\])?;"));
+         text = m.suffix())
+        edges.push_back(m[1].str() + " " + m[2].str() + " " + m[3].str());
+    EXPECT_EQ(edges, (std::vector<std::string>{"b0 b2 false", "b0 b1 ", "b1 b3 ", "b2 b4 default", "b2 b3 case",
+                                               "b3 b4 ", "b4 exit "}));
+}
+
 // ---- Whole files
 
 TEST(copying, checked_lengths) {

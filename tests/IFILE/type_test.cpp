@@ -215,6 +215,28 @@ TEST(types, members_by_number) {
     }
 }
 
+// Two declarations of one structure are one type from then on, whichever of them a record names.
+TEST(types, equal_declarations_are_merged) {
+    WORLD world;
+    FILE_BUILDER file;
+    std::string rest = by({0, 0, 0, 0, 0, 0, 0, 0});
+    for (int n : {3, 4}) file.types += type_rec(n, 24, by({0}) + str("S") + by({1, 0, 32, 16, 1, 0, 0, 0}));
+    file.types += list(3, 7, mdata(3, 1, "a", 1, rest) + mdata(3, 2, "b", 1, rest)) +
+                  list(4, 7, mdata(4, 7, "a", 1, rest) + mdata(4, 8, "b", 1, rest)) +
+                  type_rec(5, 14, str("T") + by({4, 32, 16, 0, 0, 0}));
+    file.globals += file.symbol("_t3", 3) + file.symbol("_t4", 4);
+    for (auto [type, number] : {std::pair{3, 2}, std::pair{4, 8}, std::pair{5, 8}})
+        file.statements += FILE_BUILDER::expr(node(26, 1, by({1, number, type})));
+    world.read(file.build());
+    EXPECT_EQ(find(world.unit, "_t3")->type, find(world.unit, "_t4")->type);
+    const IC_NODE* first = world.unit.items[3].tree;
+    EXPECT_EQ(first->member->name, "b");
+    for (int i : {4, 5}) {
+        EXPECT_EQ(world.unit.items[i].tree->member, first->member);
+        EXPECT_EQ(world.unit.items[i].tree->field_csu(), first->field_csu());
+    }
+}
+
 TEST(types, reserved_tags_say_nothing) {
     WORLD world;
     FILE_BUILDER file;

@@ -1,6 +1,6 @@
-// The reader over arbitrary bytes: whatever they are, it reads a unit or throws `if_error`. What was read is written, and
-// what was written must be readable.
-#include "tools/model/ic_model.h"
+// The reader over arbitrary bytes: whatever they are, it reads a unit or throws `if_error`. What was read is written,
+// and what was written must be readable.
+#include "tools/model/ic_print.h"
 
 #include <cstdlib>
 
@@ -34,6 +34,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* bytes, size_t size) {
         WORLD world;
         world.read(bytes, size);
         copy = world.write();
+        FILE* nowhere = std::fopen("/dev/null", "w");
+        ic_print_unit(nowhere, world.unit, {true, true});
+        ic_print_dot(nowhere, world.unit);
+        std::fclose(nowhere);
     } catch (const if_error&) {
         return 0;
     }

@@ -93,7 +93,7 @@ TEST(FpsimText, Literals) {
 
 TEST(FpsimText, PrintingAgainstHost) {
     Random random;
-    static const char* const formats[] = {"%.*e",     "%.*f",    "%.*g",  "%+.*e",  "%#.*g",
+    static const char* const formats[] = {"%.*e",     "%.*f",    "%.*g",  "%+.*e",  "%#.*e",
                                           "%-30.*g|", "%030.*e", "% .*f", "%30.*f", "%.*G"};
     char want[1600], got[1600];
     for (int i = operand_count() / 5; i > 0; --i) {

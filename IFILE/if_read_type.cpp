@@ -110,13 +110,9 @@ bool I_FILE::if_read_type_is_cpp(const char* name) {
 
 void I_FILE::if_read_void_type(uint64_t n) { enter_type(n, type_pkg->mk_void()); }
 
-void I_FILE::if_read_integral_type(uint64_t n, int tag) {
+void I_FILE::tp_make_integral_type(uint64_t n, int tag, bool expl_sign, uint64_t size, uint32_t align, bool is_bool,
+                                   bool flag) {
     TYPE::IKIND kind = static_cast<TYPE::IKIND>(tag >= 50 ? tag - 40 : tag);
-    bool expl_sign = i_read_bool();
-    uint64_t size = read_bits(64, "integer type");
-    uint32_t align = read_align();
-    bool is_bool = i_read_bool();
-    bool flag = i_read_bool();
     // The first bool says how the type behaves, which `bool` itself always does; the second is a mark on the type, and
     // on an integer that is no boolean there is one other mark.
     bool boolean = kind == TYPE::ik_bool ? flag : is_bool;
@@ -124,10 +120,24 @@ void I_FILE::if_read_integral_type(uint64_t n, int tag) {
     enter_type(n, type_pkg->mk_int(kind, expl_sign, size, align, boolean, ptm));
 }
 
-void I_FILE::if_read_float_type(uint64_t n, int tag) {
+void I_FILE::if_read_integral_type(uint64_t n, int tag) {
+    bool expl_sign = i_read_bool();
+    uint64_t size = read_bits(64, "integer type");
+    uint32_t align = read_align();
+    bool is_bool = i_read_bool();
+    bool flag = i_read_bool();
+    tp_make_integral_type(n, tag, expl_sign, size, align, is_bool, flag);
+}
+
+void I_FILE::tp_make_float_type(uint64_t n, int tag, uint64_t size, uint32_t align) {
     TYPE::FKIND kind = tag == 12 ? TYPE::fk_ldouble : tag == 11 ? TYPE::fk_double : TYPE::fk_float;
+    enter_type(n, type_pkg->mk_fltpt(kind, size, align));
+}
+
+void I_FILE::if_read_float_type(uint64_t n, int tag) {
     uint64_t size = read_bits(128, "floating type");
-    enter_type(n, type_pkg->mk_fltpt(kind, size, read_align()));
+    uint32_t align = read_align();
+    tp_make_float_type(n, tag, size, align);
 }
 
 void I_FILE::if_read_fixedpoint_type(uint64_t n) {
@@ -246,6 +256,10 @@ void I_FILE::if_read_csu(uint64_t n, bool long_form) {
                 type_pkg->mk_csu(kinds[kind], name, complete, lowered, size, align, cpp, is_struct_vector, word, psn),
                 lists);
 }
+
+void I_FILE::if_read_csu_short(uint64_t n) { if_read_csu(n, false); }
+
+void I_FILE::if_read_csu_long(uint64_t n) { if_read_csu(n, true); }
 
 void I_FILE::tp_make_csu(uint64_t n, TYPE* type, uint32_t lists) {
     enter_type(n, type, lists);
@@ -424,12 +438,14 @@ void I_FILE::if_read_ffriend_elem() {
 }
 
 // Friend classes and nested types: writers may name them ahead of their records, so they are looked up at the end.
-void I_FILE::if_read_late_elem(int list) {
-    CSU_EXTRAS* extras = open_list->type->csu_extras();
-    auto& items = list == 5 ? extras->friend_classes.items : extras->nested_types.items;
-    forward_refs.push_back({open_list->type, list, items.size(), i_read_uint(), record - image.get()});
-    items.push_back(nullptr);
+void I_FILE::read_forward_ref(CSU_LIST<TYPE*>& elements) {
+    forward_refs.push_back({&elements, elements.items.size(), i_read_uint(), record - image.get()});
+    elements.items.push_back(nullptr);
 }
+
+void I_FILE::if_read_cfriend_elem() { read_forward_ref(open_list->type->csu_extras()->friend_classes); }
+
+void I_FILE::if_read_ntype_elem() { read_forward_ref(open_list->type->csu_extras()->nested_types); }
 
 void I_FILE::if_read_sdata_elem() {
     std::string name = i_read_string();
@@ -456,8 +472,8 @@ void I_FILE::read_element(uint64_t n, int tag) {
     case 29: return if_read_bclass_elem();
     case 30: return if_read_adecl_elem();
     case 31: return if_read_ffriend_elem();
-    case 32: return if_read_late_elem(5);
-    case 33: return if_read_late_elem(6);
+    case 32: return if_read_cfriend_elem();
+    case 33: return if_read_ntype_elem();
     case 34: return if_read_sdata_elem();
     case 35: return if_read_mfunc_elem();
     }
@@ -484,8 +500,8 @@ void I_FILE::read_type(uint64_t n, int tag) {
     case 19: return if_read_ptm_type(n);
     case 20: return if_read_func_type(n);
     case 22: return if_read_enum_type(n);
-    case 24: return if_read_csu(n, false);
-    case 25: return if_read_csu(n, true);
+    case 24: return if_read_csu_short(n);
+    case 25: return if_read_csu_long(n);
     case 36: return if_read_complex_type(n);
     case 49: return if_read_void_type(n);
     }
@@ -514,8 +530,7 @@ void I_FILE::resolve_forward_refs() {
     for (const FORWARD_REF& ref : forward_refs) {
         TYPE_INFO* info = find_type_info(ref.number);
         if (!info) throw if_error("TP>> internal error: invalid forward reference", ref.at);
-        CSU_EXTRAS* extras = ref.owner->csu_extras();
-        (ref.list == 5 ? extras->friend_classes : extras->nested_types).items[ref.item] = info->type;
+        ref.elements->items[ref.item] = info->type;
     }
     forward_refs.clear();
 }

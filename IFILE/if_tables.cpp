@@ -1,10 +1,6 @@
 // What both directions share: the tables of symbols and file names, the position in the file, and closing.
 #include "IFILE/ifile.h"
 
-#include "UTIL/abort.h"
-
-#include <algorithm>
-#include <cstring>
 #include <utility>
 
 const char* PRAGMA::name(unsigned kind) {

@@ -77,8 +77,17 @@ void I_FILE::write_name(const BASE_NODE* node) {
     i_write_uint(static_cast<uint32_t>(sym->index));
 }
 
+namespace {
+// A reader finds the end of a tree by the operand counts: a node of another shape would garble all that follows.
+bool has_file_form(const BASE_NODE* node) {
+    if (node->op < 0 || node->op > IF_MAX_OPCODE || !if_node_info[node->op].name) return false;
+    int count = if_node_info[node->op].operand_count;
+    return (node->left_operand() != nullptr) == (count >= 1) && (node->right_operand() != nullptr) == (count == 2);
+}
+} // namespace
+
 void I_FILE::write_node(const BASE_NODE* node) {
-    OPT_ASSERT(node->op >= 0 && node->op <= IF_MAX_OPCODE);
+    OPT_ASSERT(has_file_form(node));
     begin_payload();
     i_write_i8(node->op);
     i_write_typeref(node->type);

@@ -137,6 +137,7 @@ void I_FILE::write_file_header() {
 }
 
 I_FILE* I_FILE::if_create(FILE* stream, TYPE_PKG* pkg, const char* source_name) {
+    if_node_table_init();
     I_FILE* file = new I_FILE;
     file->fp = stream;
     file->is_writer = true;

@@ -215,8 +215,7 @@ private:
     };
     // A nested type or friend class may be named before its own record.
     struct FORWARD_REF {
-        TYPE* owner;
-        int list;
+        CSU_LIST<TYPE*>* elements;
         size_t item;
         uint64_t number;
         int64_t at;
@@ -239,7 +238,7 @@ private:
     const uint8_t* record = nullptr; // its kind byte
     const uint8_t* body = nullptr;   // first byte behind the header
     std::vector<TYPE_INFO> dense_types;
-    std::vector<uint64_t> type_order; // numbers of named types in order of reading
+    std::vector<uint64_t> type_order;                            // numbers of named types in order of reading
     std::unordered_map<const TYPE*, MEMBER_TABLE> member_tables; // looked up only, never walked
     std::unique_ptr<OPEN_LIST> open_list;
     std::vector<FORWARD_REF> forward_refs;
@@ -257,7 +256,6 @@ private:
     int64_t buffer_offset = 0; // file offset of the buffer's first byte
     bool stream_failed = false;
     bool inits_open = false;
-    std::unordered_map<std::string_view, uint32_t> file_ids;
     uint32_t last_file_id = 0; // of the name entered last: positions come in runs of one file
     bool types_written = false;
     std::vector<const BASE_NODE*> waiting_nodes; // right subtrees of the tree in work
@@ -265,6 +263,7 @@ private:
 
     // ---- Both
     std::deque<std::string> file_table; // number 1 first
+    std::unordered_map<std::string_view, uint32_t> file_ids;
 
     // ---- Primitives
     [[noreturn]] void bad_input(const char* format, ...) const __attribute__((format(printf, 2, 3)));
@@ -389,6 +388,8 @@ private:
     void if_read_ptm_type(uint64_t n);
     void if_read_func_type(uint64_t n);
     void if_read_enum_type(uint64_t n);
+    void if_read_csu_short(uint64_t n);
+    void if_read_csu_long(uint64_t n);
     void if_read_csu(uint64_t n, bool long_form);
     bool if_read_type_is_cpp(const char* name);
     void if_read_list_header(uint64_t n);
@@ -399,9 +400,14 @@ private:
     void if_read_bclass_elem();
     void if_read_adecl_elem();
     void if_read_ffriend_elem();
-    void if_read_late_elem(int list);
+    void if_read_cfriend_elem();
+    void if_read_ntype_elem();
+    void read_forward_ref(CSU_LIST<TYPE*>& elements);
     void if_read_sdata_elem();
     void if_read_mfunc_elem();
+    void tp_make_integral_type(uint64_t n, int tag, bool expl_sign, uint64_t size, uint32_t align, bool is_bool,
+                               bool flag);
+    void tp_make_float_type(uint64_t n, int tag, uint64_t size, uint32_t align);
     void tp_make_list(uint64_t n, int list);
     void tp_end_list(uint64_t n, int list);
     void tp_make_csu(uint64_t n, TYPE* type, uint32_t lists);

@@ -141,7 +141,11 @@ TEST(primitives, misuse_ends_the_run) {
     sym.name = "_lost";
     IC_NODE* name = world.node(2, nullptr);
     name->mk_name(&sym);
+    IC_NODE *half = world.node(6, nullptr, name), *in_memory = world.node(176, nullptr);
     auto quiet = [&](auto work) { written(world, work); };
+    // Trees of a shape that a reader could not follow never get into a file.
+    EXPECT_EXIT(quiet([&](I_FILE& f) { f.if_write_expr_node(half); }), testing::ExitedWithCode(1), "abnormally");
+    EXPECT_EXIT(quiet([&](I_FILE& f) { f.if_write_expr_node(in_memory); }), testing::ExitedWithCode(1), "abnormally");
     EXPECT_EXIT(quiet([&](I_FILE& f) { dup2(2, 1), f.if_write_expr_node(name); }), testing::ExitedWithCode(1),
                 ">> Symbol _lost is not in the symbol table");
     EXPECT_EXIT(quiet([&](I_FILE& f) { f.if_write_dep_vector(nullptr, 0, 0, 256); }), testing::ExitedWithCode(1),

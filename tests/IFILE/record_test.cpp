@@ -104,7 +104,8 @@ TEST(records, comparisons_of_floats) {
     }
 }
 
-TEST(records, of_the_body) {
+// A function that holds every kind of record.
+FILE_BUILDER rich_unit() {
     FILE_BUILDER file;
     file.files = rec(IFR_FILE_NAME, str("a.c")) + rec(IFR_FILE_NAME, str("b.h"));
     std::string psn = by({2}) + un(1000) + by({7}), local = file.symbol("_l", 1), v = node(2, 1, by({0, 1}));
@@ -123,6 +124,11 @@ TEST(records, of_the_body) {
                 rec(IFR_CATCH_LIST, str("T") + by({70, 1})) + rec(IFR_EHT_ENTRY, by({2, 1, 1, 0})) +
                 rec(IFR_EXPR, no_psn) + v + rec(IFR_EHT_ENTRY, by({3, 5, 2, 0})) +
                 rec(IFR_EHT_ENTRY, by({4, 2, 0, 0})) + rec(IFR_CATCH_LIST, "") + rec(IFR_END_FUNC, psn);
+    return file;
+}
+
+TEST(records, of_the_body) {
+    FILE_BUILDER file = rich_unit();
     WORLD world;
     world.read(file.build());
     std::string text = listing(world.unit);
@@ -248,6 +254,28 @@ TEST(symbols, locations_name_definitions) {
     for (int i : {0, 1}) EXPECT_EQ(copy[world.unit.globals[i]->location], i == 0 ? IFR_BEGIN_FUNC : IFR_INIT);
     EXPECT_EQ(world.unit.file()->off_inits, world.unit.globals[1]->location);
     EXPECT_EQ(world.unit.globals[1]->init.size(), 2u);
+}
+
+// Whatever one byte is changed to, the reader comes back: with a unit, or with an error.
+TEST(records, every_byte_may_be_wrong) {
+    FILE_BUILDER file = rich_unit();
+    file.inits = rec(IFR_INIT, un(1)) + node(4, 1, by({5})) + node(112, 0);
+    file.options = rec(IFR_OPTION_SET, un(1) + un(1) + str("x"));
+    const std::string whole = file.build();
+    int refused = 0;
+    testing::internal::CaptureStdout();
+    for (size_t at = 0; at < whole.size(); at++)
+        for (int value : {0, 1, 0x7F, 0x80, 0xFF, whole[at] + 1, whole[at] ^ 0x40}) {
+            std::string bytes = whole;
+            bytes[at] = static_cast<char>(value);
+            WORLD world;
+            if (world.read_error(bytes).empty())
+                world.write();
+            else
+                refused++;
+        }
+    testing::internal::GetCapturedStdout();
+    EXPECT_GT(refused, 100);
 }
 
 // ---- Graphs

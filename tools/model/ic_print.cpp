@@ -82,6 +82,13 @@ void LISTING::user_type(const TYPE* type) {
             std::fprintf(out_m, "    function %s: %s\n", m.name.c_str(), m.type->printstr().c_str());
         for (const fkSDATA& s : x->static_data.items)
             std::fprintf(out_m, "    static %s: %s\n", s.name.c_str(), s.type->printstr().c_str());
+        for (const fkFFRIEND& f : x->friend_functions.items)
+            std::fprintf(out_m, "    friend %s: %s\n", f.name.c_str(), f.type->printstr().c_str());
+        for (const TYPE* t : x->friend_classes.items) std::fprintf(out_m, "    friend %s\n", t->printstr().c_str());
+        for (const TYPE* t : x->nested_types.items) std::fprintf(out_m, "    nested %s\n", t->printstr().c_str());
+        for (const fkADECL& a : x->access_decls.items) std::fprintf(out_m, "    access declaration %u\n", a.access);
+        for (const fkPARAM& p : x->parameters.items)
+            std::fprintf(out_m, "    parameter %s: %s\n", p.name.c_str(), p.type->printstr().c_str());
     }
 }
 

@@ -52,8 +52,7 @@ NODE* constant_truth(NODE* t, bool value) {
 
 // x % 2^k is zero where the low k bits are, whatever the sign.
 NODE* mask_for_MOD(NODE* t) {
-    int k = t->right->op == ICON ? power_of_2(t->right->u.lval) : -1;
-    if (t->op != MOD || k < 0 || !is_integer(t)) return t;
+    if (t->op != MOD || t->right->op != ICON || !is_integer(t) || power_of_2(t->right->u.lval) < 0) return t;
     t->op = ANDB;
     t->right->u.lval = truncate_to_type(t->right->u.lval - INT65(1), t->right->type);
     return t;

@@ -262,16 +262,14 @@ void coerce_stored_value(NODE* t) {
     t->right = coerce_to_type(to, t->right);
 }
 
-NODE* fix_ASG(NODE* t, bool normalize) {
+NODE* fix_ASG(NODE* t) {
     t->right = fix_value(t->right);
     fix_lvalue(t->left);
     coerce_stored_value(t);
-    if (normalize) {
-        if (same_variable(t->left, t->right)) return drop_assignment(t);
-        if (t->right->op == ASG && same_variable(t->left, t->right->left)) return drop_assignment(t);
-        put_variable_first(t);
-        make_compound(t);
-    }
+    if (same_variable(t->left, t->right)) return drop_assignment(t);
+    if (t->right->op == ASG && same_variable(t->left, t->right->left)) return drop_assignment(t);
+    put_variable_first(t);
+    make_compound(t);
     return with_left_type(t);
 }
 
@@ -284,7 +282,7 @@ NODE* fix_RETURN(NODE* t) {
 }
 
 // ---- One node over operands that are right already, or are made so
-NODE* fix_node(NODE* t, bool normalize_ASG) {
+NODE* fix_value(NODE* t) {
     switch (t->op) {
     case NAME:
     case UMULT:
@@ -312,7 +310,7 @@ NODE* fix_node(NODE* t, bool normalize_ASG) {
     case SRL: return fix_shift(t);
     case SWITCH: return fix_SWITCH(t);
     case RETURN: return fix_RETURN(t);
-    case ASG: return fix_ASG(t, normalize_ASG);
+    case ASG: return fix_ASG(t);
     case STASG:
     case ARASG:
         fix_lvalue(t->left);
@@ -329,11 +327,20 @@ NODE* fix_node(NODE* t, bool normalize_ASG) {
     return t;
 }
 
-NODE* fix_value(NODE* t) { return fix_node(t, true); }
-
 } // namespace
 
-NODE* insert_mandatory_casts(NODE* tree) { return tree ? fix_node(tree, true) : tree; }
+NODE* insert_mandatory_casts(NODE* tree) {
+    if (!tree) return tree;
+    bool is_assignment = opcode_is_ASG(tree->op);
+    tree = fix_value(tree);
+    // An assignment that stands alone has the type of its variable; its value needs no cast.
+    while (is_assignment && (tree->op == SCONV || tree->op == PCONV) && opcode_is_ASG(tree->left->op)) {
+        NODE* cast = tree;
+        tree = cast->left;
+        erase_node(cast);
+    }
+    return tree;
+}
 
 // A cast that was moved under a sum goes back above it; the sum gets the type of its own pointer again.
 NODE* remove_pushed_down_casts(NODE* tree) {

@@ -1,0 +1,232 @@
+// The target model and the built-in functions.
+
+#include "../ir/tree_builder.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
+
+using namespace test_trees;
+
+namespace {
+
+class Target : public Trees {
+protected:
+    void SetUp() override { start_as(28, 10); }
+    void TearDown() override { start_as(28, 10); }
+
+    static void start_as(int version, int unit) {
+        cpu_version = version;
+        init_target();
+        float_support = unit;
+        is_fpu64 = unit == 11;
+        init_BIF_descriptors();
+    }
+    static NODE* args(std::initializer_list<NODE*> list) {
+        NODE* out = nullptr;
+        for (NODE* a : list) out = arg_list_append(out, a);
+        return out;
+    }
+};
+
+TEST_F(Target, SiliconVersions) {
+    rtc_unified_memory = true;
+    cpu_version = -1;
+    init_target();
+    EXPECT_EQ(cpu_version, 28);
+    EXPECT_TRUE(rtc_RPT_ok_for_loop);
+    cpu_version = 27;
+    init_target();
+    EXPECT_EQ(TYPE_PKG::cpu_version, 27);
+    EXPECT_FALSE(rtc_RPT_ok_for_loop);
+    cpu_version = 29;
+    testing::internal::CaptureStdout();
+    init_target();
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "\n>>>> Warning: unrecognized option: '-v29'\n\n");
+    EXPECT_EQ(cpu_version, 28);
+    rtc_unified_memory = false;
+}
+
+TEST_F(Target, MemoryReferencesByKind) {
+    EXPECT_EQ(target_memref[tp->int_t->ekind()][0], 1);
+    EXPECT_EQ(target_memref[tp->ulong_t->ekind()][0], 2);
+    EXPECT_EQ(target_memref[tp->llong_t->ekind()][0], 4);
+    EXPECT_EQ(target_memref[tp->float_t->ekind()][0], 2);
+    EXPECT_EQ(target_memref[tp->double_t->ekind()][0], 0);
+    EXPECT_EQ(target_memref[tp->ldouble_t->ekind()][0], 4);
+    EXPECT_EQ(target_memref[tp->void_ptr_t->ekind()][0], 0);
+}
+
+TEST_F(Target, QuestionsAboutTrees) {
+    EXPECT_TRUE(offset_is_in_range(INT65(32767), tp->int_t, 1));
+    EXPECT_FALSE(offset_is_in_range(INT65(32768), tp->int_t, 1));
+    EXPECT_FALSE(offset_is_in_range(INT65(-1), tp->int_t, 1));
+    NODE* x = name(symbol("x", tp->int_t));
+    NODE* wide = name(symbol("l", tp->long_t));
+    EXPECT_EQ(show(cpu_bit_test_subtree(bin(NEQ, bin(ANDB, copy_tree(x), icon(8)), icon(0)))), "x");
+    EXPECT_EQ(show(cpu_bit_test_subtree(bin(EQ, bin(ANDB, wide, icon(8, tp->long_t)), icon(0)))), "l & 8L");
+    EXPECT_EQ(show(cpu_bit_test_subtree(bin(LE, copy_tree(x), icon(0)))), "x <= 0");
+    EXPECT_EQ(cost_for_DIV_to_MULT_expr(bin(DIV, bin(PLUS, copy_tree(x), icon(1)), icon(3))), 670);
+}
+
+TEST_F(Target, StackVariables) {
+    init_reg_defs();
+    SYMTAB *a = symbol("a", tp->int_t), *v = symbol("v", tp->mk_qual(tp->int_t, QUAL_VOLATILE)),
+           *s = symbol("s", sample_struct());
+    SYMTAB *parm = symbol("p", tp->int_t, 1, SC_AUTO), *aliased = symbol("q", tp->int_t);
+    SYMTAB* array = symbol("t", tp->mk_array(tp->int_t, false, 4, true));
+    aliased->set_is_aliased(true);
+    SYMTAB* all[] = {a, v, s, parm, aliased, array};
+    for (int i = 0; i < 5; ++i) all[i]->next = all[i + 1];
+    EXPECT_EQ(sort_stack_variables(a), a);
+    EXPECT_EQ(a->sclass, SC_REGISTER2);
+    EXPECT_EQ(a->value, 0u);
+    EXPECT_EQ(s->sclass, SC_REGISTER2);
+    EXPECT_EQ(s->value, 1u);
+    for (SYMTAB* other : {v, parm, aliased, array}) EXPECT_EQ(other->sclass, SC_AUTO) << other->name;
+}
+
+TEST_F(Target, RegisterSets) {
+    BITVEC set(4);
+    SYMTAB* r = symbol("r", tp->int_t);
+    r->value = 9;
+    add_reg_to_set(r, &set);
+    EXPECT_EQ(set.count(), 1u);
+    EXPECT_TRUE(set.test(9));
+    remove_reg_from_set(r, &set);
+    EXPECT_TRUE(set.empty());
+    r->value = 64;
+    add_reg_to_set(r, &set);
+    EXPECT_TRUE(set.empty());
+}
+
+TEST_F(Target, InstancesFollowVersionAndUnit) {
+    EXPECT_TRUE(find_target_BIF_descriptor("__min")->has(IS_PROPER_MINVAL));
+    EXPECT_FALSE(find_BIF_descriptor("__min")->has(IS_GENERIC));
+    EXPECT_EQ(find_BIF_descriptor("__min")->partner, find_BIF_descriptor("MIN"));
+    EXPECT_EQ(find_target_BIF_descriptor("MINU"), nullptr); // generic, without an instance
+    EXPECT_NE(find_BIF_descriptor("__fmin"), nullptr);
+    EXPECT_EQ(find_BIF_descriptor("__fmin64"), nullptr);
+    EXPECT_EQ(find_target_BIF_descriptor("DISABLE_INTERRUPTS")->name, "__disable_interrupts"); // the last one made
+    start_as(28, 0);
+    EXPECT_EQ(find_BIF_descriptor("__fmin"), nullptr);
+    EXPECT_EQ(find_BIF_descriptor("__sinpuf32"), nullptr);
+    start_as(28, 11);
+    EXPECT_NE(find_BIF_descriptor("__fmax64"), nullptr);
+    start_as(27, 0);
+    EXPECT_EQ(find_BIF_descriptor("__min"), nullptr);
+    EXPECT_NE(find_BIF_descriptor("_enable_interrupts"), nullptr);
+}
+
+TEST_F(Target, SignaturesComeFromTheTable) {
+    BIF* bif = find_BIF_descriptor("__rpt_subcul");
+    ASSERT_EQ(bif->nparams, 4);
+    EXPECT_EQ(bif->return_type, tp->ulong_t);
+    EXPECT_EQ(get_BIF_parameter('A', bif)->type, tp->mk_ptr(tp->ulong_t));
+    EXPECT_EQ(get_BIF_parameter('c', bif)->type, tp->int_t);
+    // One symbol for one letter and type.
+    EXPECT_EQ(get_BIF_parameter('a', find_BIF_descriptor("__rol"))->u.sym,
+              get_BIF_parameter('a', find_BIF_descriptor("__ror"))->u.sym);
+    EXPECT_NE(get_BIF_parameter('a', find_BIF_descriptor("__rol"))->u.sym,
+              get_BIF_parameter('a', find_BIF_descriptor("__flip16"))->u.sym);
+    EXPECT_TRUE(find_BIF_descriptor("__rpt_mov_imm_far")->return_type->type_pointed_to()->qual_kind(false) & QUAL_FAR);
+    EXPECT_EQ(find_BIF_descriptor("_symval")->return_type, tp->ulong_t);
+}
+
+TEST_F(Target, MisuseOfDescriptorsIsInternal) {
+    auto dies = testing::ExitedWithCode(1);
+    EXPECT_EXIT(make_BIF_descriptor(ICALL, "__rol", 1, tp->long_t), dies,
+                "INTERNAL ERROR in make_BIF_descriptor\\(\\) for \"__rol\"");
+    EXPECT_EXIT(make_BIF_descriptor(PLUS, "__new", 1, tp->long_t), dies, "make_BIF_descriptor");
+    EXPECT_EXIT(instantiate_generic_BIF("__x", find_BIF_descriptor("__rol")), dies,
+                "INTERNAL ERROR in instantiate_generic_BIF");
+    EXPECT_EXIT(get_BIF_parameter('z', find_BIF_descriptor("__rol")), dies, "");
+    BIF* bif = make_BIF_descriptor(ICALL, "__new", 2, tp->long_t);
+    EXPECT_EXIT(def_BIF_parameter(bif, 1, tp->int_t, 'b'), dies, "INTERNAL ERROR in def_BIF_parameter");
+    add_BIF_semantics(bif, icon(1), true);
+    EXPECT_TRUE(bif->has(MUST_EXPAND));
+    EXPECT_EXIT(add_BIF_semantics(bif, icon(1), false), dies, "INTERNAL ERROR in add_BIF_semantics");
+}
+
+TEST_F(Target, AssociativePairs) {
+    BIF* other = instantiate_associative_BIF("__mpy_a", find_BIF_descriptor("__mpy"));
+    EXPECT_TRUE(other->has(IS_SELF_ASSOCIATIVE));
+    EXPECT_TRUE(other->has(TOWERS_LIKE_PLUS));
+    EXPECT_EQ(find_BIF_descriptor("__mpy")->associative_partner, other);
+    EXPECT_EXIT(instantiate_associative_BIF("__mpy_b", other), testing::ExitedWithCode(1), "");
+}
+
+TEST_F(Target, ArgumentsTakeTheirParametersTypes) {
+    SYMTAB *i = symbol("i", tp->int_t), *l = symbol("l", tp->long_t), *u = symbol("u", tp->uint_t);
+    struct {
+        NODE* call;
+        const char* text;
+    } cases[] = {
+        {mk_ICALL("__mpy", args({name(l), name(i)}), tp->long_t), "__mpy((int)l, i)"},
+        {mk_ICALL("__mpy", args({name(i), name(i)}), tp->int_t), "(int)__mpy(i, i)"},
+        {mk_ICALL("__mpy", args({name(l)}), tp->long_t), "__mpy(l)"}, // another count
+        {mk_ICALL("__unheard_of", args({name(u)}), tp->int_t), "__unheard_of(u)"},
+        {mk_ICALL("DONOTCSE", args({name(u)}), tp->uint_t), "DONOTCSE(u)"},
+        {mk_MCALL("__rpt_rol", args({name(i), name(l)}), tp->long_t), "__rpt_rol(i, l)"}, // an MCALL stays
+        {mk_ICALL("quest$colon", args({name(i), name(l), name(u)}), tp->long_t), "quest$colon(i, l, u)"},
+    };
+    for (const auto& c : cases) {
+        NODE* t = insert_mandatory_casts(c.call);
+        EXPECT_EQ(show(t), c.text);
+        EXPECT_EQ(show(insert_mandatory_casts(t)), c.text) << "twice";
+    }
+}
+
+TEST_F(Target, BoundsOfCalls) {
+    auto bounds = [](NODE* call) {
+        return std::make_pair(calculate_minval_for_BIF_call(call, nullptr),
+                              calculate_maxval_for_BIF_call(call, nullptr));
+    };
+    using P = std::pair<INT65, INT65>;
+    NODE* x = name(symbol("x", tp->int_t));
+    EXPECT_EQ(bounds(mk_MCALL("__norm32", args({icon(1, tp->long_t), copy_tree(x)}), tp->long_t)), P(0, 31));
+    EXPECT_EQ(bounds(mk_MCALL("__norm64", args({icon(1, tp->llong_t), copy_tree(x)}), tp->llong_t)), P(0, 63));
+    EXPECT_EQ(bounds(mk_ICALL("__abs16_sat", args({copy_tree(x)}), tp->int_t)), P(0, 32767));
+    EXPECT_EQ(bounds(mk_ICALL("__min", args({copy_tree(x), icon(9)}), tp->int_t)), P(-32768, 9));
+    EXPECT_EQ(bounds(mk_ICALL("__max", args({icon(3), icon(9)}), tp->int_t)), P(9, 9));
+    EXPECT_EQ(bounds(mk_ICALL("__unheard_of", args({icon(3)}), tp->uint_t)), P(0, 65535));
+}
+
+TEST_F(Target, WhatCommonSubexpressionsMayTake) {
+    NODE* tbit = mk_ICALL("__tbit", args({icon(1), icon(2)}), tp->int_t);
+    EXPECT_FALSE(ok_to_CSE_ICALL(tbit));
+    EXPECT_FALSE(ok_to_CSE_ICALL_opds(tbit));
+    NODE* rol = mk_ICALL("__rol", icon(1), tp->long_t);
+    EXPECT_TRUE(ok_to_CSE_ICALL(rol));
+    EXPECT_TRUE(ok_to_CSE_ICALL_opds(rol));
+    EXPECT_FALSE(ok_to_CSE_ICALL(mk_ICALL("DONOTCSE", icon(1), tp->int_t)));
+    EXPECT_FALSE(ok_to_CSE_ICALL(mk_ICALL("__x", nullptr, tp->int_t)));
+    EXPECT_TRUE(ok_to_CSE_ICALL_opds(mk_ICALL("__x", nullptr, tp->int_t)));
+    EXPECT_EQ(find_unCSEable_opds(rol), 255u);
+    EXPECT_TRUE(is_barrier_MCALL("__add"));
+    EXPECT_TRUE(is_barrier_MCALL("_disable_interrupts"));
+    EXPECT_FALSE(is_barrier_MCALL("__dmac"));
+    EXPECT_FALSE(is_barrier_MCALL("strlen"));
+}
+
+TEST_F(Target, InOutArguments) {
+    SYMTAB *x = symbol("x", tp->long_t), *found = nullptr;
+    NODE* direct = maketree(ARGREF, name(x), nullptr, tp->mk_ptr(tp->long_t));
+    NODE* through = maketree(ARGREF, deref(address(name(x))), nullptr, tp->mk_ptr(tp->long_t));
+    for (NODE* t : {direct, through}) {
+        found = nullptr;
+        EXPECT_TRUE(tree_is_IN_OUT_argument(t, &found));
+        EXPECT_EQ(found, x);
+    }
+    EXPECT_FALSE(tree_is_IN_OUT_argument(name(x), &found));
+}
+
+TEST_F(Target, StrictTernaries) {
+    NODE* t = bin(QUEST, name(symbol("c", tp->int_t)), bin(COLON, icon(1), icon(2)), tp->int_t);
+    t = make_strict_ternary_ICALL(t);
+    EXPECT_TRUE(is_strict_ternary_ICALL(t));
+    EXPECT_EQ(show(t), "quest$colon(c, 1, 2)");
+    EXPECT_EQ(show(undo_strict_ternary_ICALL(t, false)), "c ? 1 : 2");
+}
+
+} // namespace

@@ -35,7 +35,6 @@ static int substitutions(const char* name) {
 static char* spelling(const char* name) {
     if (strncmp(name, "_Z", 2) != 0 && !is_type_encoding(name)) return nullptr;
     if (strlen(name) > max_length || substitutions(name) > max_substitutions) return nullptr;
-    std::lock_guard<std::mutex> hold(demangle_lock);
     int status = 0;
     return abi::__cxa_demangle(name, nullptr, nullptr, &status);
 }

@@ -7,7 +7,8 @@
 // 0: names of the older scheme, which have no mangled form known here; 1: names of the Itanium scheme. Set by the
 // options.
 extern int decode_mangle_scheme;
-// Guards the demangler's static state.
+// Held by whoever prints names, so that the lines of one dump stay together. The functions here have no static state and
+// take no lock.
 extern std::mutex demangle_lock;
 
 // The source's spelling of a mangled function, variable or type name; any other name comes back as it is. A null name

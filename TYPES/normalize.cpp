@@ -3,7 +3,7 @@
 //
 // Normalization strips typedefs everywhere and collapses integers and floats that the target does not tell apart, so
 // that the passes see one type for each machine type. It never changes a size or an alignment of what it replaces: an
-// integer whose layout is not the package's own stays as it is.
+// integer whose layout is not the package's own stays as it is. A type that was merged into another takes the other's place.
 #include "TYPES/type_impl.h"
 
 void TYPE_PKG::normalize_basic_types() {
@@ -79,7 +79,7 @@ TYPE* TYPE::normalized_type_uncached() {
         case tpk_enum:
         case tpk_class:
         case tpk_struct:
-        case tpk_union: form = t; break;
+        case tpk_union: form = find_type(t); break;
         case tpk_int:
         case tpk_float: form = normalized_basic(t); break;
         case tpk_func:

@@ -10,7 +10,7 @@
 #include <unordered_map>
 
 std::recursive_mutex mk_ptr_lock;
-std::recursive_mutex rt_lock;
+std::recursive_mutex& rt_lock = mk_ptr_lock;
 std::recursive_mutex mdata_lock;
 TYPE_PKG* tp;
 

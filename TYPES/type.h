@@ -24,8 +24,9 @@ class TYPE_PKG;
 
 // Guards `ptr_to` and `normalized`, and with them the creation of derived types.
 extern std::recursive_mutex mk_ptr_lock;
-// Guards `register_type` and the based-type maps.
-extern std::recursive_mutex rt_lock;
+// Guards `register_type` and the based-type maps. Deriving a type registers it, and a walk of the maps may ask for a
+// normalized type: the two nest both ways, so they are one mutex.
+extern std::recursive_mutex& rt_lock;
 // Guards the creation of members.
 extern std::recursive_mutex mdata_lock;
 

@@ -1,5 +1,7 @@
 #include "fixture.h"
 
+#include <thread>
+
 TEST_F(Types, EqualTypesAreOne) {
     TYPE* s = structure("S", nullptr);
     EXPECT_EQ(pkg.mk_ptr(s), pkg.mk_ptr(s, 32, 32));
@@ -93,6 +95,8 @@ TEST_F(Types, MergeOfSelfReferringStructures) {
     EXPECT_EQ(b->uid, a->uid);
     EXPECT_EQ(find_type(pb), pkg.mk_ptr(a)); // what hung from b hangs from a, and merges
     EXPECT_FALSE(find_equivalent_type(a));
+    EXPECT_EQ(b->normalized_type(), a);
+    EXPECT_EQ(pb->normalized_type(), pkg.mk_ptr(a));
     std::vector<TYPE*> order = type_tree_order(TYPE_PKG::root_type);
     for (TYPE* t : {a, b, pkg.mk_ptr(a), pb}) EXPECT_EQ(std::count(order.begin(), order.end(), t), 1);
 }
@@ -178,6 +182,23 @@ TEST_F(Types, DeleteTree) {
     size_t before = type_tree_order(TYPE_PKG::root_type).size();
     pkg.delete_type_tree(s, 1, 0);
     EXPECT_EQ(type_tree_order(TYPE_PKG::root_type).size(), before - 2);
+}
+
+// Passes make types on every worker: all must get the same ones.
+TEST_F(Types, MakersFromManyThreads) {
+    std::vector<TYPE*> made[4];
+    auto work = [this](std::vector<TYPE*>* out) {
+        for (uint32_t i = 2; i < 300; ++i) {
+            TYPE* v = pkg.mk_vector(pkg.short_t, false, i);
+            TYPE* p = pkg.mk_ptr(pkg.mk_qual(v, QUAL_CONST));
+            out->insert(out->end(),
+                        {v, p, p->normalized_type(), function(p, param(v)), pkg.mk_unsigned(v), pkg.mk_vpred()});
+        }
+    };
+    std::vector<std::thread> workers;
+    for (auto& out : made) workers.emplace_back(work, &out);
+    for (auto& w : workers) w.join();
+    for (auto& out : made) EXPECT_EQ(out, made[0]);
 }
 
 // ---- Input of any size

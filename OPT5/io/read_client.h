@@ -55,6 +55,7 @@ private:
     };
 
     void append(NODE* tree, PSN* psn);
+    void note_label(uint32_t label);
     void make_ptr_entries(const SYMTAB* outer);
     void close_scope(PSN* psn);
     void apply_function_pragma(SYMTAB* sym, const PRAGMA& pragma);

@@ -61,14 +61,19 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
         cl_expr(start, psn);
     }
     tree = expr_cleanup(tree);
+    if (tree->op == LABELDEF) note_label(static_cast<uint32_t>(tree->lbl->index)); // the head of a counted loop
     LS::initialize_scopes_and_ptrs_from_tree(tree);
     append(tree, psn);
 }
 
-void OPT_CLIENT::cl_label(uint32_t label) {
+void OPT_CLIENT::note_label(uint32_t label) {
     if (label > INT_MAX) refuse_input("label number " + std::to_string(label) + " is out of range");
-    if (lex == 0) refuse_input("a label stands outside a function");
     if (!labels.insert(label).second) refuse_input("label " + std::to_string(label) + " is defined twice");
+}
+
+void OPT_CLIENT::cl_label(uint32_t label) {
+    if (lex == 0) refuse_input("a label stands outside a function");
+    note_label(label);
     // A branch to the label that follows at once does nothing.
     LIST*& statements = currfuninfo->statements;
     if (statements && statements->first->op == BRANCH && statements->first->left &&

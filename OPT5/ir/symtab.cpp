@@ -137,8 +137,8 @@ void split_symbol(FUNINFO* funinfo, SYMTAB* sym) {
 void sym_split(FUNINFO* funinfo) {
     check_for_cycle(funinfo->scalar_syms);
     for (SYMTAB** waiting : {&funinfo->new_syms, &funinfo->pending_syms}) {
-        // Taken in order of creation, so that the lists do not depend on how often symbols were split.
-        SYMTAB* sym = revsymtab(*waiting);
+        // Newest first, so that what was waiting stands in order of creation.
+        SYMTAB* sym = *waiting;
         *waiting = nullptr;
         while (sym) {
             SYMTAB* next = sym->next;

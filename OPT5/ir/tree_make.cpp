@@ -100,7 +100,7 @@ NODE* mk_MINUS(NODE* a, NODE* b) {
 
 static NODE* mk_intrinsic(int op, const char* name, NODE* args, TYPE* type) {
     NODE* t = maketree(op, args, nullptr, type);
-    t->u.name = safestrdup(name);
+    t->mk_icall(name);
     return t;
 }
 NODE* mk_ICALL(const char* name, NODE* args, TYPE* type) {

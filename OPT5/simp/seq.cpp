@@ -253,6 +253,15 @@ void seq_trees() {
 
 // ---- Exception dispatch
 
+namespace {
+// A label of the input: the graph builder finds its block by the number.
+NODE* ref_to_numbered(uint32_t label) {
+    NODE* t = new_node(LABELREF, tp->int_t);
+    t->mk_label(label);
+    return t;
+}
+} // namespace
+
 NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through) {
     LS* scope = call->ls;
     NODE* cases = nullptr;
@@ -260,7 +269,7 @@ NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through) {
     for (const EHT_ITEM& item : currfuninfo->eht)
         for (const EHT_CATCH& clause : item.catches) {
             NODE* entry = maketree(CASE, mk_ICON(INT65(clause.id), tp->int_t),
-                                   mk_LABELREF(static_cast<int32_t>(clause.label)), tp->int_t, scope);
+                                   ref_to_numbered(static_cast<uint32_t>(clause.label)), tp->int_t, scope);
             ++count;
             cases = cases ? maketree(COMMA, cases, entry, tp->int_t, scope) : entry;
         }

@@ -1,0 +1,203 @@
+// What reading does to a function, seen in what is written again.
+
+#include "unit_builder.h"
+
+namespace {
+
+class ReadTest : public UnitTest {};
+
+TEST_F(ReadTest, CommentsAndInlineAssemblyKeepTheirPlace) {
+    file->if_write_comment("of the file");
+    file->if_write_comment("* of a tool");
+    begin_main();
+    set(x, icon(1));
+    file->if_write_comment("between");
+    file->if_write_comment("*hidden");
+    file->if_write_assembly(" NOP", &psn);
+    set(y, icon(2));
+    ret(node(op::PLUS, pkg.int_t, name(x), name(y)));
+    end();
+    expect_lines({"// of the file", "x = 1", "// between", "asm \" NOP\"", "y = 2", "return x + y"});
+    expect_no_line("of a tool");
+    expect_no_line("hidden");
+}
+
+TEST_F(ReadTest, ABranchToTheLabelThatFollowsDisappears) {
+    begin_main();
+    set(x, icon(1));
+    go(7);
+    label(7);
+    ret(name(x));
+    end();
+    expect_lines({"x = 1", "return x"});
+    expect_no_line("goto");
+    expect_no_line("\nL");
+}
+
+TEST_F(ReadTest, CountedLoopsBecomeBranchesOnTheCounter) {
+    begin_main();
+    set(x, icon(3));
+    statement(node(op::LOOP, pkg.int_t, name(x), ref(4)));
+    statement(node(op::PLUSASG, pkg.int_t, name(y), icon(1)));
+    statement(node(op::ENDLOOP, pkg.int_t, name(x), ref(4)));
+    ret(name(y));
+    end();
+    // The decrement is compared with -1: false, and so back to the label, while the counter was not 0.
+    expect_lines({"x = 3", "L1:", "y += 1", "if (!((x -= 1) == -1)) goto L1", "return y"});
+}
+
+TEST_F(ReadTest, TheHeadOfACountedLoopKeepsItsEffect) {
+    begin_main();
+    statement(node(op::LOOP, pkg.int_t, node(op::ASG, pkg.int_t, name(x), icon(3)), ref(4)));
+    statement(node(op::ENDLOOP, pkg.int_t, name(x), ref(4)));
+    ret(name(x));
+    end();
+    expect_lines({"x = 3", "L1:", "if (!((x -= 1) == -1)) goto L1"});
+}
+
+TEST_F(ReadTest, PointerScalingIsMultiplicationByAddressUnits) {
+    begin_main();
+    set(y, node(op::PMCONV, pkg.int_t, name(x), icon(48)));
+    ret(name(y));
+    end();
+    expect_lines({"y = x * 3"});
+}
+
+TEST_F(ReadTest, WithoutAnExceptionTableCallsHaveNoEntry) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    begin_main();
+    set(x, call(f, nullptr, 9));
+    ret(name(x));
+    end();
+    expect_lines({"x = _f()"});
+}
+
+TEST_F(ReadTest, IncrementsConditionsAndCommasForEffectAreSequenced) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    begin_main();
+    statement(node(op::PLUSPLUS, pkg.int_t, name(x), icon(1)));
+    statement(node(op::COMMAOP, pkg.int_t, node(op::ASG, pkg.int_t, name(x), icon(5)), call(f)));
+    statement(node(op::QUEST, pkg.int_t, name(x), node(op::COLON, pkg.int_t, call(f), node(op::ASG, pkg.int_t, name(y), icon(6)))));
+    statement(node(op::ANDAND, pkg.int_t, name(y), call(f)));
+    ret(name(x));
+    end();
+    expect_lines({"x += 1", "x = 5", "_f()", "if (!(!x)) goto L2", "y = 6", "goto L3", "L2:", "_f()", "L3:", "if (!(y)) goto L5",
+                  "_f()", "L5:", "return x"});
+}
+
+TEST_F(ReadTest, ShortCircuitConditionsAreOneBranchATest) {
+    begin_main();
+    IC_NODE* either = node(op::OROR, pkg.int_t, node(op::LT, pkg.int_t, name(x), icon(3)), node(op::GT, pkg.int_t, name(y), icon(4)));
+    unless(node(op::ANDAND, pkg.int_t, either, name(x)), 5);
+    set(x, icon(1));
+    label(5);
+    ret(name(x));
+    end();
+    expect_lines({"if (!(x >= 3)) goto L2", "if (!(y > 4)) goto L4", "L2:", "if (!(x)) goto L4", "x = 1", "L4:", "return x"});
+}
+
+// ---- Intrinsics
+
+TEST_F(ReadTest, AnUnknownIntrinsicIsCalledByName) {
+    begin_main();
+    set(x, intrinsic(op::MCALL, "mystery", pkg.int_t, name(y)));
+    set(y, intrinsic(op::MCALL, "mystery", pkg.int_t, name(x)));
+    ret(name(x));
+    end();
+    expect_lines({"x = _mystery(y)", "y = _mystery(x)"});
+    const std::string text = dump();
+    EXPECT_EQ(text.find("_mystery: int(int), class 5"), text.rfind("_mystery: int(int), class 5")) << "declared once\n" << text;
+}
+
+TEST_F(ReadTest, AnUnknownIntrinsicFindsTheFunctionOfThatName) {
+    IC_SYMBOL* f = global("_mystery", function_type({pkg.int_t}, pkg.int_t), 5);
+    (void)f;
+    begin_main();
+    set(x, intrinsic(op::MCALL, "mystery", pkg.int_t, name(y)));
+    ret(name(x));
+    end();
+    expect_lines({"x = _mystery(y)"});
+}
+
+TEST_F(ReadTest, UnderTheSecondAbiNamesHaveNoPrefix) {
+    begin_main();
+    statement(intrinsic(op::UMCALL, "mystery", pkg.void_t));
+    ret(name(x));
+    end();
+    expect_lines({"mystery()"}, {"--abi=eabi", "--opt_level=off"});
+}
+
+TEST_F(ReadTest, AKnownMachineOperationLosesItsHiddenOperandAgain) {
+    begin_main();
+    statement(intrinsic(op::UMCALL, "__eallow", pkg.void_t));
+    statement(intrinsic(op::MCALL, "__inc", pkg.void_t, node(op::UAND, pkg.mk_ptr(pkg.int_t), name(x))));
+    ret(name(x));
+    end();
+    expect_lines({"__eallow()", "__inc(&x)", "return x"});
+    expect_no_line("ARGREF");
+}
+
+TEST_F(ReadTest, ABranchHintComesBackAsItWas) {
+    begin_main();
+    IC_NODE* args = node(op::COMMA, pkg.long_t, node(op::SCONV, pkg.long_t, name(x)), icon(0, pkg.long_t));
+    IC_NODE* expect = intrinsic(op::ICALL, "__builtin_expect", pkg.long_t, args);
+    unless(node(op::NEQ, pkg.int_t, expect, icon(0, pkg.long_t)), 2);
+    set(y, icon(1));
+    label(2);
+    ret(name(y));
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    EXPECT_NE(dump().find("__builtin_expect("), std::string::npos) << dump();
+}
+
+// ---- Input that is refused
+
+TEST_F(ReadTest, LabelsMustBeDefinedOnce) {
+    begin_main();
+    go(3);
+    ret(name(x));
+    end();
+    expect_refusal("label 3 is not defined");
+}
+TEST_F(ReadTest, LabelsMustNotBeDefinedTwice) {
+    begin_main();
+    label(3);
+    label(3);
+    ret(name(x));
+    end();
+    expect_refusal("label 3 is defined twice");
+}
+TEST_F(ReadTest, AFunctionHasOneBody) {
+    begin_main();
+    ret(name(x));
+    end();
+    begin(main_sym);
+    end_args();
+    end_locals();
+    ret(icon(1));
+    end();
+    expect_refusal("_main is defined twice");
+}
+TEST_F(ReadTest, OnlyFunctionsHaveBodies) {
+    IC_SYMBOL* v = global("_v", pkg.int_t);
+    begin(v);
+    end_args();
+    end_locals();
+    end();
+    expect_refusal("_v, which is no function");
+}
+TEST_F(ReadTest, ACallMustNameAnEntryOfTheTable) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    begin_main();
+    set(x, call(f, nullptr, 9));
+    ret(name(x));
+    EHT_ENTRY root;
+    root.id = 1;
+    root.kind = EHK_ROOT_NODE;
+    file->if_write_func_eht(&root, 1);
+    end();
+    expect_refusal("exception entry 9");
+}
+
+} // namespace

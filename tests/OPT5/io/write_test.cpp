@@ -1,0 +1,279 @@
+// The form in which functions leave.
+
+#include "unit_builder.h"
+
+namespace {
+
+class WriteTest : public UnitTest {};
+
+TEST_F(WriteTest, ConditionsAreNegatedWhereThatLetsControlFallThrough) {
+    begin_main();
+    unless(node(op::LT, pkg.int_t, name(x), name(y)), 1);
+    go(2);
+    label(1);
+    set(x, icon(1));
+    label(2);
+    ret(name(x));
+    end();
+    // The true way leads on to the return, the false way to the assignment that follows.
+    expect_lines({"if (!(x >= y)) goto L2", "x = 1", "L2:", "return x"});
+    expect_no_line("\ngoto");
+}
+
+TEST_F(WriteTest, ALoopAtTheEndBranchesBackWithoutAnExtraJump) {
+    begin_main();
+    label(1);
+    statement(node(op::PLUSASG, pkg.int_t, name(x), icon(1)));
+    unless(node(op::LT, pkg.int_t, name(x), icon(10)), 2);
+    go(1);
+    label(2);
+    ret(name(x));
+    end();
+    expect_lines({"L1:", "x += 1", "if (!(x >= 10)) goto L1", "return x"});
+}
+
+TEST_F(WriteTest, ASwitchNamesAllItsTargetsAndCountsItsCases) {
+    begin_main();
+    auto one_case = [&](long v, uint32_t l) { return node(op::CASE, pkg.int_t, icon(v), ref(l)); };
+    IC_NODE* sw = node(op::SWITCH, pkg.int_t, name(x), node(op::COMMA, pkg.int_t, one_case(1, 1), one_case(5, 2)));
+    sw->number = 2;
+    statement(sw);
+    set(y, icon(9));
+    label(1);
+    set(y, icon(1));
+    label(2);
+    ret(name(y));
+    end();
+    expect_lines({"switch (x) { case 1: L2; case 5: L3; default: L1; }", "L1:", "y = 9", "L2:", "y = 1", "L3:", "return y"});
+}
+
+TEST_F(WriteTest, WideConstantsAreLconsOnlyWhereTheyMustBe) {
+    IC_SYMBOL* small = global("_small", pkg.llong_t);
+    IC_SYMBOL* wide = global("_wide", pkg.llong_t);
+    begin_main();
+    IC_NODE* big = node(op::LCON, pkg.llong_t);
+    big->text = "4294967296";
+    IC_NODE* fits = node(op::LCON, pkg.llong_t);
+    fits->text = "-2147483648";
+    statement(node(op::ASG, pkg.llong_t, name(wide), big));
+    statement(node(op::ASG, pkg.llong_t, name(small), fits));
+    ret(icon(0));
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const std::string raw = place.get("unit.opt");
+    EXPECT_NE(raw.find(std::string("4294967296\0", 11)), std::string::npos);
+    EXPECT_EQ(raw.find("-2147483648"), std::string::npos) << "it fits an ICON";
+    expect_lines({"_wide = 4294967296", "_small = -2147483648"});
+}
+
+TEST_F(WriteTest, ParametersKeepTheirOrderAndUnusedLocalsGo) {
+    IC_SYMBOL* f = global("_f", function_type({pkg.int_t, pkg.long_t, pkg.int_t}, pkg.int_t));
+    begin(f);
+    IC_SYMBOL* a = local("a", pkg.int_t, 17);
+    IC_SYMBOL* b = local("b", pkg.long_t, 17);
+    IC_SYMBOL* c = local("c", pkg.int_t, 17);
+    end_args();
+    IC_SYMBOL* a2 = local("a", pkg.int_t);
+    local("b", pkg.long_t);
+    IC_SYMBOL* c2 = local("c", pkg.int_t);
+    local("idle", pkg.int_t);
+    end_locals();
+    (void)b;
+    statement(node(op::PCOMMA, pkg.void_t, node(op::ASG, pkg.int_t, name(a2), name(a)), node(op::ASG, pkg.int_t, name(c2), name(c))));
+    statement(node(op::RETURN, pkg.int_t, name(f), node(op::PLUS, pkg.int_t, name(a2), name(c2))));
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const std::string text = dump();
+    const size_t pa = text.find("0 a: int, class 17"), pb = text.find("1 b: long, class 17"), pc = text.find("2 c: int, class 17");
+    EXPECT_TRUE(pa < pb && pb < pc && pc != std::string::npos) << text;
+    EXPECT_EQ(text.find("idle"), std::string::npos);
+    EXPECT_EQ(text.find("b: long, class 1,"), std::string::npos) << "the copy of b was not used";
+}
+
+TEST_F(WriteTest, DeclaredTypesComeBack) {
+    TYPE* color = pkg.mk_enum("color", pkg.int_t, 16, 16, false);
+    auto* red = new fkETOR;
+    red->name = "red";
+    red->value = 3;
+    pkg.set_etors(color, red);
+    pkg.type_frozen(color);
+    IC_SYMBOL* g = global("_g", pkg.mk_qual(color, QUAL_VOLATILE));
+    IC_SYMBOL* s = global("_s", pkg.short_t);
+    begin_main();
+    statement(node(op::ASG, color, name(g), icon(3)));
+    statement(node(op::ASG, pkg.short_t, name(s), icon(4)));
+    ret(icon(0));
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const std::string text = dump();
+    EXPECT_NE(text.find("_g: volatile enum color"), std::string::npos) << text;
+    EXPECT_NE(text.find("_s: short"), std::string::npos) << text;
+    EXPECT_NE(text.find("red = 3"), std::string::npos) << text;
+}
+
+TEST_F(WriteTest, LeavesAreMarkedAndCallersAreNot) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    begin_main();
+    ret(icon(1));
+    end();
+    IC_SYMBOL* caller = global("_g", int_fn);
+    begin(caller);
+    end_args();
+    end_locals();
+    statement(node(op::RETURN, pkg.int_t, name(caller), call(f)));
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const std::string text = dump();
+    const size_t leaf = text.find("leaf");
+    ASSERT_NE(leaf, std::string::npos) << text;
+    EXPECT_EQ(text.find("leaf", leaf + 1), std::string::npos) << text;
+}
+
+TEST_F(WriteTest, WhatStandsBehindACallThatNeverReturnsGoes) {
+    IC_SYMBOL* f = pragma(global("_stop", function_type({}, pkg.void_t), 5), 3);
+    begin_main();
+    statement(call(f));
+    set(x, icon(1));
+    ret(name(x));
+    end();
+    expect_lines({"_stop()"});
+    expect_no_line("x = 1");
+}
+
+TEST_F(WriteTest, AStatementForItsValueAloneGoesButNotAVolatileRead) {
+    IC_SYMBOL* v = global("_v", pkg.mk_qual(pkg.int_t, QUAL_VOLATILE), 5);
+    begin_main();
+    statement(node(op::PLUS, pkg.int_t, name(x), icon(1)));
+    statement(name(v));
+    ret(icon(0));
+    end();
+    expect_lines({"_v", "return 0"});
+    expect_no_line("x + 1");
+}
+
+// ---- Exception tables
+
+class TableTest : public WriteTest {
+protected:
+    static EHT_ENTRY entry(uint32_t id, uint32_t kind, uint32_t next) {
+        EHT_ENTRY e;
+        e.id = id;
+        e.kind = kind;
+        e.next = next;
+        return e;
+    }
+};
+
+TEST_F(TableTest, UnusedEntriesGoAndCallsAreRenumbered) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    begin_main();
+    set(x, call(f, nullptr, 4));
+    ret(name(x));
+    std::vector<EHT_ENTRY> table{entry(1, EHK_ROOT_NODE, 0), entry(2, EHK_CLEANUP, 1), entry(3, EHK_CLEANUP, 1), entry(4, EHK_CLEANUP_END, 3)};
+    table[1].cleanup = call(f);
+    table[2].cleanup = call(f);
+    file->if_write_func_eht(table.data(), 4);
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    IC_UNIT unit;
+    TYPE_PKG types;
+    tp = &types;
+    TYPE_PKG::init_type_pkg(&types);
+    unit.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), &types);
+    const IC_ITEM* eht = nullptr;
+    const IC_NODE* tree = nullptr;
+    for (const IC_ITEM& item : unit.items) {
+        if (item.kind == IFR_EHT_HEADER) eht = &item;
+        if (item.kind == IFR_EXPR && item.tree && item.tree->op == op::ASG) tree = item.tree;
+    }
+    ASSERT_TRUE(eht && tree);
+    // Entry 4 does nothing and leads to 3, which closes up behind the unused 2; what the call named stays as well.
+    ASSERT_EQ(eht->number, 3u);
+    EXPECT_EQ(eht->eht[1].id, 2u);
+    EXPECT_EQ(eht->eht[1].kind, uint32_t(EHK_CLEANUP));
+    EXPECT_EQ(eht->eht[1].next, 1u);
+    EXPECT_EQ(tree->right->number2, 2u);
+}
+
+TEST_F(TableTest, HandlersStayReachableAndTheirLabelsFollow) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    begin_main();
+    set(y, icon(5));
+    set(x, call(f, nullptr, 2));
+    ret(name(x));
+    label(77);
+    ret(name(y));
+    std::vector<EHT_ENTRY> table{entry(1, EHK_ROOT_NODE, 0), entry(2, EHK_CATCH, 1)};
+    table[1].count = 1;
+    table[1].catches.push_back({"int", 77, false});
+    file->if_write_func_eht(table.data(), 2);
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const std::string text = dump();
+    EXPECT_NE(text.find("\nL1:\nreturn y\n"), std::string::npos) << text;
+    EXPECT_EQ(text.find("dispatch"), std::string::npos) << "it is not for the code generator";
+    IC_UNIT unit;
+    TYPE_PKG types;
+    tp = &types;
+    TYPE_PKG::init_type_pkg(&types);
+    unit.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), &types);
+    for (const IC_ITEM& item : unit.items)
+        if (item.kind == IFR_EHT_HEADER) {
+            EXPECT_EQ(item.eht[1].catches.at(0).label, 1u);
+        }
+}
+
+// ---- The unit as a whole
+
+TEST_F(WriteTest, TheOutputIsAFixedPoint) {
+    IC_SYMBOL* f = global("_f", function_type({pkg.int_t}, pkg.int_t), 5);
+    begin_main();
+    label(1);
+    set(x, call(f, name(y)));
+    unless(node(op::EQ, pkg.int_t, name(x), icon(0)), 2);
+    statement(intrinsic(op::UMCALL, "__eallow", pkg.void_t));
+    go(1);
+    label(2);
+    ret(name(x));
+    end();
+    for (const char* level : {"off", "0", "1", "2", "3", "4"}) {
+        const RESULT r = optimize({std::string("--opt_level=") + level});
+        ASSERT_EQ(r.status, 0) << r.err;
+        std::string once = dump();
+        place.put("again.if", place.get("unit.opt"));
+        ASSERT_EQ(place.run({std::string("--opt_level=") + level, "again.if", "unit.opt"}).status, 0);
+        std::string twice = dump();
+        auto body = [](const std::string& s) { return s.substr(s.find("\nfunction ")); };
+        EXPECT_EQ(body(once), body(twice)) << "level " << level;
+    }
+}
+
+TEST_F(WriteTest, StaticDataNamedOnlyByAnInitializerIsKept) {
+    IC_SYMBOL* target = global("_target", pkg.int_t, 3);
+    IC_SYMBOL* pointer = global("_pointer", pkg.mk_ptr(pkg.int_t), 2);
+    begin_main();
+    ret(icon(0));
+    end();
+    file->if_write_init(pointer);
+    file->if_write_expr_node(node(op::UAND, pkg.mk_ptr(pkg.int_t), name(target)));
+    file->if_write_expr_node(node(op::ENDINIT, pkg.int_t));
+    const RESULT r = optimize({"--opt_level=3", "--call_assumptions=3"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    IC_UNIT unit;
+    TYPE_PKG types;
+    tp = &types;
+    TYPE_PKG::init_type_pkg(&types);
+    unit.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), &types);
+    for (const IC_SYMBOL* s : unit.globals)
+        if (std::string(s->name) == "_target") {
+            EXPECT_NE(s->retention, I_SYMTAB::RETENTION_DROP);
+        }
+}
+
+} // namespace

@@ -1,3 +1,4 @@
+// The names and the version stand here and nowhere else.
 #include "BANNER/banner.h"
 
 namespace {

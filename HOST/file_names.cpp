@@ -1,3 +1,4 @@
+// Names are taken apart as text; whether two of them lead to one file is asked of the system.
 #include "HOST/file_names.h"
 
 #include <sys/stat.h>

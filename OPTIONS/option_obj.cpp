@@ -11,8 +11,6 @@ namespace {
 constexpr char TAG[] = "opt option debug";
 } // namespace
 
-option_obj::option_obj(bool) {}
-
 // ---- Setting
 
 void option_obj::setopt(int id) {

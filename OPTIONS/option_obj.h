@@ -143,7 +143,7 @@ public:
     static std::map<std::string, std::string> tool_cmd_map;                // tool to its command
     static std::map<std::string, std::vector<std::string>> tn_fileopt_map; // tool to options given for it
 
-    explicit option_obj(bool from_tool = true);
+    explicit option_obj(bool check_conflicts = true) : no_conflicts(!check_conflicts) {}
 
     // ---- Parsing. `word` is the option less its first hyphen.
     // True when the whole word was consumed; otherwise `*rest`, if given, is the place that no option accepts.

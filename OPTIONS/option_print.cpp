@@ -6,7 +6,7 @@
 namespace {
 
 constexpr int FORMS = 10;
-constexpr int HELP_COLUMN = 34;
+constexpr int HELP_COLUMN = 34; // where the text behind a name begins
 
 std::string words_of(const option_obj::option_item* item) {
     std::string words;
@@ -43,8 +43,10 @@ void option_obj::dump_class(class_id help_class) {
     for (int id = 0; id < OPTION_COUNT; ++id) {
         if (!option_definitions[id].forms[0] || !isclass(id, help_class)) continue;
         const std::string form = get_opt_txt(id);
-        std::printf("  %-*s ", HELP_COLUMN - 3, form.c_str());
-        if (form.size() > HELP_COLUMN - 3) std::printf("\n%*s", HELP_COLUMN, "");
+        if (form.size() > HELP_COLUMN - 3)
+            std::printf("  %s\n%*s", form.c_str(), HELP_COLUMN, "");
+        else
+            std::printf("  %-*s ", HELP_COLUMN - 3, form.c_str());
         std::printf("%s", option_definitions[id].help[0]);
         const std::string words = words_of(option_definitions[id].items);
         if (!words.empty()) std::printf(" {%s}", words.c_str());

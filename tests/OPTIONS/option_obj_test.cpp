@@ -373,12 +373,15 @@ TEST(OptionHelp, ShowsEveryOptionOnce) {
     const std::string text = testing::internal::GetCapturedStdout();
     for (int id = 0; id < O::OPTION_COUNT; ++id) {
         if (!O::option_definitions[id].forms[0]) continue;
-        const std::string line = "\n  " + O::get_opt_txt(id) + " ";
+        const std::string line = "\n  " + O::get_opt_txt(id);
         const std::size_t at = text.find(line);
-        EXPECT_NE(at, std::string::npos) << line;
+        ASSERT_NE(at, std::string::npos) << line;
+        EXPECT_TRUE(text[at + line.size()] == ' ' || text[at + line.size()] == '\n') << line;
         EXPECT_EQ(text.find(line, at + 1), std::string::npos) << line;
+        EXPECT_NE(text.find(O::option_definitions[id].help[0], at), std::string::npos) << line;
     }
     EXPECT_NE(text.find("{off,0,1,2,3,4}"), std::string::npos);
+    EXPECT_EQ(text.find(" \n"), std::string::npos) << "no blanks at line ends";
     EXPECT_EXIT(O().process_option("-usage", nullptr), testing::ExitedWithCode(0), "");
     EXPECT_EXIT(O().process_option("a?", nullptr), testing::ExitedWithCode(0), "");
 }

@@ -228,7 +228,8 @@ void I_FILE::if_read_func_type(uint64_t n) {
 
 void I_FILE::if_read_enum_type(uint64_t n) {
     std::string name = i_read_string();
-    uint64_t size = read_bits(64, "enumeration");
+    uint64_t size = i_read_uint(); // 0 for one that is declared only
+    if (size > 64) bad_input("enumeration of %llu bits", static_cast<unsigned long long>(size));
     uint32_t align = read_align();
     TYPE* underlying = need_typeref("enumeration");
     if (!underlying->is_int()) bad_input("enumeration over a type that is no integer");

@@ -209,6 +209,7 @@ TEST(errors, types) {
         types("integer type of 65 bits", type_rec(9, 6, by({0, 65, 16, 0, 0}))),
         types("alignment 4294967296 does not fit 32 bits", type_rec(9, 10, by({32}) + un(uint64_t{1} << 32))),
         types("structure of kind 3", type_rec(9, 24, by({3}) + str("s") + by({1, 0, 32, 16, 0, 0, 0, 0}))),
+        types("enumeration of 65 bits", type_rec(9, 22, str("e") + by({65, 16, 1, 0, 0}))),
         types("enumeration over a type that is no integer", type_rec(9, 22, str("e") + by({16, 16, 2, 0, 0}))),
         {"FIELD names member 2 of type 9, which has none of that number",
          [=](FILE_BUILDER& f) {

@@ -79,7 +79,7 @@ TEST(types, enumerators_have_the_sign_of_their_type) {
                   list(6, 1, type_rec(6, 23, str("c") + un(UINT32_MAX) + by({0}))) +
                   type_rec(7, 22, str("W") + by({64, 32, 4, 0, 0})) +
                   list(7, 1, type_rec(7, 23, str("d") + by({0x80, 0x80, 0x80, 0x80, 0x80, 0x70, 0}))) +
-                  type_rec(8, 22, str("N") + by({16, 16, 1, 0, 0})) + list(8, 1, "");
+                  type_rec(8, 22, str("N") + by({0, 0, 1, 0, 0})) + list(8, 1, "");
     TWICE t(file, {5, 6, 7, 8});
     EXPECT_TRUE(t[5]->cpp);
     EXPECT_EQ(t[5]->etors()->value, -1);

@@ -71,6 +71,39 @@ TEST(Fpsim, SinglesAgainstHost) {
     }
 }
 
+// Exact results a hair beside the midpoint of two doubles, the hair below the digits that the simulator holds: rounding
+// them to nearest twice gives the midpoint, and then the wrong double every other time.
+TEST(Fpsim, MidpointsAreNotMadeByRoundingTwice) {
+    Random random;
+    const uint64_t mask = (uint64_t{1} << 53) - 1, half = uint64_t{1} << 52;
+    int products = 0;
+    for (int i = operand_count() / 5; i > 0; --i) {
+        // a * b has the low bits 2^52 + 1 or 2^52 - 1: a is that times the inverse of b modulo 2^53.
+        uint64_t b = (random.next() & mask) | half | 1, inverse = b;
+        for (int k = 0; k < 5; ++k) inverse *= 2 - b * inverse;
+        uint64_t a = inverse * (half + (i & 1 ? 1 : -1)) & mask;
+        int scale = static_cast<int>(random.next() % 64);
+        simul_fval x, y, r;
+        if (a & half) {
+            ++products;
+            double da = ldexp(static_cast<double>(a), -scale), db = static_cast<double>(b);
+            x = sim(da);
+            y = sim(db);
+            f_mul(&x, &y, &r);
+            ASSERT_TRUE(same(r, da * db)) << da << " * " << db;
+        }
+        double large = ldexp(static_cast<double>(b), -scale);
+        double small = ldexp(i & 1 ? 1 + 0x1p-52 : 1 - 0x1p-53, -scale - (i & 2 ? 1 : 2));
+        x = sim(large);
+        y = sim(small);
+        f_add(&x, &y, &r);
+        ASSERT_TRUE(same(r, large + small)) << large << " + " << small;
+        f_sub(&x, &y, &r);
+        ASSERT_TRUE(same(r, large - small)) << large << " - " << small;
+    }
+    EXPECT_GT(products, 1000);
+}
+
 TEST(Fpsim, ConversionsAgainstHost) {
     Random random;
     for (int i = operand_count(); i > 0; --i) {

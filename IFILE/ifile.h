@@ -121,8 +121,7 @@ public:
     static I_FILE* if_open(FILE* stream, IF_CLIENT* client, std::string* why = nullptr);
     static I_FILE* if_open_basic(FILE* stream, IF_CLIENT* client, std::string* why = nullptr);
     static I_FILE* if_create(FILE* stream, TYPE_PKG* pkg, const char* source_name);
-    // Writes the trailing sections unless `discard`, frees the object, closes the stream. 1 if the stream failed, else
-    // 0.
+    // Writes the trailing sections unless `discard`, frees the object, closes the stream. 1 if the stream failed.
     static int if_close(I_FILE* file, bool keep_all_types, bool discard);
 
     // ---- Reader
@@ -174,8 +173,8 @@ public:
     void if_write_ldspec_region(uint32_t id, uint32_t label);
     void if_write_func_eht(const EHT_ENTRY* entries, uint32_t count);
     void if_write_type(TYPE* type);
-    void
-    if_reference_type(TYPE* type); // marks it, and what it was merged into, as needed by the output; null does nothing
+    // Marks the type, and what it was merged into, as needed by the output. Null does nothing.
+    void if_reference_type(TYPE* type);
     void if_write_all_types(bool keep_named);
 
     // ---- Both

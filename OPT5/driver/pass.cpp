@@ -84,7 +84,7 @@ std::vector<int> random_order(int n) {
     std::srand(static_cast<unsigned>(std::time(nullptr) + std::clock()));
     constexpr double per_draw = 4.656612873077393e-10; // of a draw from [0, 2^31): a fraction of 1
     for (int i = 0; i + 1 < n; ++i) {
-        const int j = static_cast<int>(std::rand() * (i + 2) * per_draw);
+        const int j = static_cast<int>(per_draw * std::rand() * (i + 2));
         v[i + 1] = v[j];
         v[j] = i + 1;
     }

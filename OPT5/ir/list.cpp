@@ -2,6 +2,7 @@
 
 #include "OPT5/ir/list.h"
 
+#include "OPT5/ir/node.h"
 #include "OPT5/ir/pool.h"
 
 void* LIST::operator new(std::size_t) { return record_pool<sizeof(LIST)>::take(); }
@@ -40,3 +41,7 @@ LIST* last_cell(LIST* list) {
         while (list->rest) list = list->rest;
     return list;
 }
+
+NODE* nl_left_child(const NODELIST* list) { return list ? list->first->left : nullptr; }
+NODE* list_left_child(const LIST* list) { return list ? list->first->left : nullptr; }
+NODE* pair_left_child(const NODEPAIRLIST* list) { return list ? list->a->left : nullptr; }

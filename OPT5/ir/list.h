@@ -25,6 +25,21 @@ struct LLIST {
     LLIST* next;
 };
 
+// Trees that a pass remembers; a list owns its cells only.
+struct NODELIST {
+    NODE* first;
+    NODELIST* rest;
+};
+struct NODEPAIRLIST {
+    NODE* a;
+    NODE* b;
+    NODEPAIRLIST* rest;
+};
+// The left operand of the first tree; null for an empty list.
+NODE* nl_left_child(const NODELIST* list);
+NODE* list_left_child(const LIST* list);
+NODE* pair_left_child(const NODEPAIRLIST* list); // of the pair's first
+
 LIST* mkelist(NODE* tree, LIST* rest, PSN* psn);
 LIST* mklist(NODE* tree, LIST* rest, uint16_t flag1, uint16_t flag2);
 LLIST* mklistlist(LIST* list, LLIST* next);

@@ -8,7 +8,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <mutex>
 
 uint32_t max_scalar_alignment;
 uint64_t max_scalar_stride, pointer_type_stride;
@@ -20,10 +19,7 @@ namespace {
 constexpr int IKINDS = TYPE::ik_ullong + 1;
 TYPE* widening_integers[IKINDS];
 
-TYPE* normalized(TYPE* t) {
-    std::lock_guard<std::recursive_mutex> guard(mk_ptr_lock);
-    return t->normalized_type();
-}
+TYPE* normalized(TYPE* t) { return t->normalized_type(); }
 
 bool is_narrow(const TYPE* t) { return t->size < tp->int_t->size; }
 

@@ -22,8 +22,8 @@ namespace {
 
 std::map<std::string, std::unique_ptr<BIF>, std::less<>> descriptors;
 
-[[noreturn]] void internal_error(const char* where) {
-    fprintf(stderr, "\n\n!!! INTERNAL ERROR in %s()\n", where);
+[[noreturn]] void internal_error(const char* text) {
+    fputs(text, stderr);
     abort_optimizer();
 }
 
@@ -114,7 +114,7 @@ private:
         if (word("void")) return tp->void_t;
         if (word("F32")) return TYPE_PKG::abi == 1 ? tp->float_t : tp->double_t;
         if (word("UADDRESS")) return tp->int_t->size == 32 ? tp->uint_t : tp->ulong_t;
-        internal_error("init_BIF_descriptors");
+        internal_error("\n\n!!! INTERNAL ERROR in init_BIF_descriptors()\n");
     }
 };
 
@@ -148,11 +148,11 @@ void make_row(const ROW& row) {
     BIF* bif = make_BIF_descriptor(row.opcode, row.name, count_parameters(row.parameters), ret.type());
     bif->flags = row.flags | (row.when == GENERIC ? IS_GENERIC : 0u);
     for (int i = 0; i < bif->nparams; ++i) {
-        if (i && !list.comma()) internal_error("init_BIF_descriptors");
+        if (i && !list.comma()) internal_error("\n\n!!! INTERNAL ERROR in init_BIF_descriptors()\n");
         TYPE* type = list.type();
         def_BIF_parameter(bif, i, type, list.letter());
     }
-    if (!list.at_end()) internal_error("init_BIF_descriptors");
+    if (!list.at_end()) internal_error("\n\n!!! INTERNAL ERROR in init_BIF_descriptors()\n");
     if ((row.flags & BOUNDED_BY_WIDTH) == BOUNDED_BY_WIDTH)
         bif->maxval = INT65(arg_list_lookup(bif->parameters, 0)->type->size) - INT65(1);
 }
@@ -212,7 +212,7 @@ BIF* make_simple_BIF(int opcode, const char* name, int nparams, TYPE* ret, ...) 
 
 void def_BIF_parameter(BIF* bif, int index, TYPE* type, char letter) {
     if (!bif || !type || index >= bif->nparams || index != arg_list_count(bif->parameters))
-        internal_error("def_BIF_parameter");
+        internal_error("\n\n!!! INTERNAL ERROR in def_BIF_parameter()\n");
     NODE* name = new_node(NAME, type);
     name->u.sym = pooled_parameter(letter, type);
     bif->parameters = arg_list_append(bif->parameters, name);
@@ -223,11 +223,11 @@ NODE* get_BIF_parameter(char letter, BIF* bif) {
         NODE* p = arg_list_lookup(bif->parameters, i);
         if (p && p->u.sym->name[0] == letter) return p;
     }
-    internal_error("get_BIF_parameter");
+    internal_error("\n\n!!! INTERNAL ERROR in get_BIF_parameter()\n");
 }
 
 void add_BIF_semantics(BIF* bif, NODE* tree, bool must_expand) {
-    if (!bif || !tree || bif->semantics) internal_error("add_BIF_semantics");
+    if (!bif || !tree || bif->semantics) internal_error("\n\n!!! INTERNAL ERROR in add_BIF_semantics()\n");
     bif->semantics = tree;
     if (must_expand) bif->flags |= MUST_EXPAND;
 }
@@ -246,7 +246,7 @@ static BIF* copy_of(const char* name, const BIF* from) {
 }
 
 BIF* instantiate_generic_BIF(const char* name, BIF* generic) {
-    if (!generic || !generic->has(IS_GENERIC)) internal_error("instantiate_generic_BIF");
+    if (!generic || !generic->has(IS_GENERIC)) internal_error("\n\n!!! INTERNAL ERROR in instantiate_generic_BIF()\n");
     BIF* bif = copy_of(name, generic);
     bif->partner = generic;
     generic->partner = bif;
@@ -254,7 +254,8 @@ BIF* instantiate_generic_BIF(const char* name, BIF* generic) {
 }
 
 BIF* instantiate_associative_BIF(const char* name, BIF* bif) {
-    if (!bif || bif->has(IS_GENERIC) || bif->associative_partner) internal_error("instantiate_associative_BIF");
+    if (!bif || bif->has(IS_GENERIC) || bif->associative_partner)
+        internal_error("\n\n!!! INTERNAL ERROR in instantiate_associative_BIF()\n");
     BIF* other = copy_of(name, bif);
     other->flags |= IS_SELF_ASSOCIATIVE;
     if (other->nparams == 2 && other->has(OPDS_0_1_COMMUTE)) other->flags |= TOWERS_LIKE_PLUS;
@@ -265,7 +266,7 @@ BIF* instantiate_associative_BIF(const char* name, BIF* bif) {
 
 void set_BIF_hooks(const char* name, BIF::SIMPLIFIER simplifier, BIF::EVALUATOR evaluator) {
     BIF* bif = find_BIF_descriptor(name);
-    if (!bif) internal_error("set_BIF_hooks");
+    if (!bif) internal_error("\n\n!!! INTERNAL ERROR in set_BIF_hooks()\n");
     for (auto& entry : descriptors) {
         BIF* b = entry.second.get();
         if (b != bif && !(bif->has(IS_GENERIC) && b->partner == bif)) continue;

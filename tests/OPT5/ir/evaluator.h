@@ -108,13 +108,16 @@ inline VALUE compute(int op, VALUE a, VALUE b, SHAPE s) {
     switch (op) {
     case PLUS: return integer(a.i + b.i, s);
     case MINUS: return integer(a.i - b.i, s);
-    case MULT: return integer(a.i * b.i, s);
+    case MULT:
+        return integer(static_cast<I128>(static_cast<unsigned __int128>(a.i) * static_cast<unsigned __int128>(b.i)), s);
     case ANDB: return integer(a.i & b.i, s);
     case ORB: return integer(a.i | b.i, s);
     case XORB: return integer(a.i ^ b.i, s);
     case DIV: return b.i == 0 ? undefined_value() : integer(a.i / b.i, s);
     case MOD: return b.i == 0 ? undefined_value() : integer(a.i % b.i, s);
-    case SLL: return b.i < 0 || b.i >= s.bits ? undefined_value() : integer(a.i << b.i, s);
+    case SLL:
+        return b.i < 0 || b.i >= s.bits ? undefined_value()
+                                        : integer(static_cast<I128>(static_cast<unsigned __int128>(a.i) << b.i), s);
     case SRL: return b.i < 0 || b.i >= s.bits ? undefined_value() : integer(a.i >> b.i, s);
     }
     return undefined_value();

@@ -176,6 +176,16 @@ TEST_F(TreeNode, ErasingTwiceIsReported) {
 }
 #endif
 
+TEST_F(TreeNode, SharedNodesAreReported) {
+    NODE *shared = icon(1), *sum = bin(PLUS, shared, icon(2));
+    LIST* list = mkelist(sum, mkelist(un(UMINUS, shared), nullptr, nullptr), nullptr);
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(report_shared_nodes(list), 1);
+    EXPECT_NE(testing::internal::GetCapturedStderr().find("(ICON) is shared\n"), std::string::npos);
+    list->rest->first->left = icon(1);
+    EXPECT_EQ(report_shared_nodes(list), 0);
+}
+
 TEST_F(TreeNode, DeepTreesLeanLeft) {
     NODE* t = icon(0);
     for (int i = 0; i < 200000; ++i) t = bin(PLUS, t, icon(1), tp->int_t);

@@ -82,13 +82,15 @@ bool is_integer_chain(const NODE* t) {
 struct chain {
     const NODE* operand[MAX_CHAIN];
     int count = 0;
+    int operators = 0; // counted on the way down, so that a long chain is given up before its end
     bool fits = true;
 };
 
 void collect(const NODE* t, const NODE* root, chain* out) {
     t = without_wrappers(t);
     if (t->op == root->op && equiv_mtypes(t->type, root->type)) {
-        collect(t->left, root, out);
+        out->fits &= ++out->operators < MAX_CHAIN;
+        if (out->fits) collect(t->left, root, out);
         if (out->fits) collect(t->right, root, out);
     } else if (out->count < MAX_CHAIN && equiv_mtypes(t->type, root->type)) {
         out->operand[out->count++] = t;
@@ -202,7 +204,9 @@ bool same_op_is_congruent(const NODE* a, const NODE* b, bool se_ok) {
 }
 
 bool types_allow_congruence(const NODE* a, const NODE* b) {
-    if (a->type == b->type || equiv_mtypes(a->type, b->type)) return true;
+    if (a->type == b->type) return true;
+    if (!a->type || !b->type) return false;
+    if (equiv_mtypes(a->type, b->type)) return true;
     return a->op == NAME && b->op == NAME && a->u.sym == b->u.sym && compatible_types(a->type, b->type, false);
 }
 

@@ -3,6 +3,7 @@
 #include "../ir/evaluator.h"
 
 #include "OPT5/simp/simp.h"
+#include "UTIL/big_stack.h"
 
 #include <cstring>
 
@@ -226,6 +227,27 @@ TEST_F(Simp, BitFieldsTruncateWhatTheyStore) {
     NODE* bits = member(name(symbol("s", sample_struct())), sample_member(1)); // unsigned, 3 bits
     EXPECT_EQ(truncate_RHS_for_assignment(bits, icon(13))->u.lval, INT65(5));
     EXPECT_EQ(truncate_RHS_for_assignment(name(symbol("x", tp->int_t)), icon(70000, tp->long_t))->u.lval, INT65(4464));
+}
+
+// As deep as the reader accepts, leaning to either side, in time that grows with the size.
+TEST_F(Simp, DeepTrees) {
+    run_on_big_stack(std::size_t(1) << 30, [] {
+        SYMTAB *x = symbol("x", tp->int_t), *y = symbol("y", tp->int_t);
+        for (bool leans_left : {true, false}) {
+            NODE *t = name(x), *other = name(y);
+            for (int i = 0; i < 200000; ++i) {
+                t = leans_left ? bin(PLUS, t, icon(1), tp->int_t) : bin(PLUS, icon(1), t, tp->int_t);
+                other = leans_left ? bin(PLUS, other, icon(1), tp->int_t) : bin(PLUS, icon(1), other, tp->int_t);
+            }
+            EXPECT_FALSE(trees_are_congruent(t, other, false));
+            EXPECT_TRUE(trees_are_congruent(t, copy_tree(t), false));
+            t = simp_tree(insert_mandatory_casts(bin(ASG, name(y), t, tp->int_t)), nullptr);
+            EXPECT_GT(tree_to_infix(t).size(), 800000u);
+            EXPECT_EQ(peel_for_effect(t), t);
+            EXPECT_EQ(peel_for_effect(other), nullptr);
+            erase_tree(t);
+        }
+    });
 }
 
 TEST_F(Simp, IllegalOpcodesEndTheRun) {

@@ -86,6 +86,35 @@ TEST_F(Target, StackVariables) {
     for (SYMTAB* other : {v, parm, aliased, array}) EXPECT_EQ(other->sclass, SC_AUTO) << other->name;
 }
 
+// Addresses of members become sums, and what stands in memory all the same stays.
+TEST_F(Target, AddressesAreLoweredAheadOfRegisterAssignment) {
+    SYMTAB *s = symbol("s", sample_struct()), *q = symbol("q", tp->mk_ptr(sample_struct())),
+           *p = symbol("p", tp->mk_ptr(tp->int_t));
+    TYPE* to_long = tp->mk_ptr(tp->long_t);
+    struct {
+        NODE* tree;
+        const char* text;
+    } cases[] = {
+        {address(deref(name(p))), "p"},
+        {address(member(name(s), sample_member(2))), "(long *)&s + 2L"},
+        {address(member(name(s), sample_member(0))), "(int *)&s"},
+        {address(member(name(q), sample_member(2), STREF)), "(long *)q + 2L"},
+        {member(name(q), sample_member(1), STREF), "(*q).bits"},
+        {un(PCONV, address(deref(name(p))), to_long), "(long *)p"},
+    };
+    BBLK* bb = new BBLK(currfuninfo);
+    LIST* list = nullptr;
+    for (const auto& c : cases) list = mkelist(c.tree, list, nullptr);
+    bb->statements = list = reverse_list(list);
+    currfuninfo->bb_list = bb;
+    allocate_regs();
+    currfuninfo->bb_list = nullptr;
+    for (const auto& c : cases) {
+        EXPECT_EQ(show(list->first), c.text);
+        list = list->rest;
+    }
+}
+
 TEST_F(Target, RegisterSets) {
     BITVEC set(4);
     SYMTAB* r = symbol("r", tp->int_t);

@@ -18,6 +18,7 @@ void I_FILE::if_read_expr_name(BASE_NODE* node) {
 
 void I_FILE::if_read_expr_field(BASE_NODE* node) {
     int kind = i_read_s8();
+    if (kind != 1) bad_input("FIELD of kind %d, expected 1", kind);
     uint64_t member_number = i_read_uint();
     uint64_t type_number = i_read_uint();
     TYPE* csu = find_typeref(type_number);

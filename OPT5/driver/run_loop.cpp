@@ -59,7 +59,7 @@ private:
 void announce_function() {
     const std::string line(80, '=');
     if (write_opt_info) info_printf("%s\n", line.c_str());
-    dump_function_header();
+    dump_function_header(true);
     if (write_opt_info) info_printf("%s\n", line.c_str());
     dump_FUNINFO(currfuninfo, 0);
     if (print_debug && TEST_FLAG(currfuninfo, FUN_is_unsuppressed) && opt_level() >= 3)

@@ -49,7 +49,6 @@ void retype_arguments(NODE* call) {
 
 NODE* cleanup_LOOP(NODE* t) {
     NODE* label = t->right;
-    if (!label || label->op != LABELREF) refuse_input("a loop head names no label");
     auto* lbl = new LBL;
     lbl->index = static_cast<int32_t>(label->label_id());
     NODE* def = mk_LABELDEF(lbl);
@@ -59,7 +58,6 @@ NODE* cleanup_LOOP(NODE* t) {
 
 // Counts down and goes back while the counter, before the step, was not 0.
 NODE* cleanup_ENDLOOP(NODE* t) {
-    if (!t->left || !t->right || t->right->op != LABELREF) refuse_input("a loop end without counter or label");
     NODE* counter = t->left;
     TYPE* type = counter->type;
     NODE* step = maketree(MINUSASG, counter, mk_ICON(INT65(1), type), type, t->ls);
@@ -113,7 +111,6 @@ NODE* cleanup_node(NODE* t) {
     if (t->type->kind != TYPE::tpk_void) t->type = normalized_value_type(t->type);
     switch (t->op) {
     case NAME:
-        if (!t->u.sym) refuse_input("a NAME without a symbol");
         t->u.sym = get_sym_def_for_decl(t->u.sym);
         return t;
     case UAND: note_address_taken(t); return t;
@@ -128,6 +125,11 @@ NODE* cleanup_node(NODE* t) {
         return t;
     case PMCONV: return cleanup_PMCONV(t);
     case CBRANCH: convert_CBRANCH_with_builtin_expect(t); return t;
+    case DDNODE: { // what an earlier run learned of the access is dropped with its records
+        NODE* access = t->left;
+        erase_node(t);
+        return access;
+    }
     case EPVAL: {
         NODE* child = t->left;
         if (child->op == LABELREF) child->set_edge_profile_value(t->get_edge_profile_value());

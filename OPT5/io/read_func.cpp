@@ -54,6 +54,7 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
     if (!base) return;
     auto* tree = static_cast<NODE*>(base);
     if (lex == 0) refuse_input("a statement stands outside a function");
+    check_statement(tree);
     // What the head of a counted loop evaluates stays as a statement ahead of the loop's label.
     if (tree->op == LOOP && tree->left && tree_has_side_effects(tree->left)) {
         NODE* start = tree->left;
@@ -193,6 +194,7 @@ bool OPT_CLIENT::cl_func_eht(EHT_ENTRY* entries, uint32_t count) {
         item.kind = e.kind;
         item.next_entry = e.next;
         if (e.cleanup) {
+            check_statement(static_cast<NODE*>(e.cleanup));
             item.cleanup = expr_cleanup(static_cast<NODE*>(e.cleanup));
             LS::initialize_scopes_and_ptrs_from_tree(item.cleanup);
         }

@@ -99,7 +99,10 @@ void OPT_CLIENT::cl_symbol_init(I_SYMTAB* isym, std::vector<BASE_NODE*>& list) {
     auto* sym = static_cast<SYMTAB*>(isym);
     if (sym->autoinit) refuse_input("symbol " + std::string(sym->name) + " is initialized twice");
     sym->autoinit = new std::vector<NODE*>;
-    for (BASE_NODE* item : list) sym->autoinit->push_back(expr_cleanup(static_cast<NODE*>(item)));
+    for (BASE_NODE* item : list) {
+        check_initializer_item(static_cast<NODE*>(item));
+        sym->autoinit->push_back(expr_cleanup(static_cast<NODE*>(item)));
+    }
     for (NODE* item : *sym->autoinit)
         if (item->op != ENDINIT) scan_for_funinfo(item);
     const bool fixed = !(sym->cqual & (CQ_ALIASED | CQ_WRITTEN)) && sym->type->is_scalar() && sym->autoinit->size() == 2;

@@ -226,11 +226,13 @@ void dump_FUNINFO(FUNINFO* f, int to_info) {
     if (out && f) dump_funinfo_to(out, f);
 }
 
-void dump_function_header() {
+void dump_function_header(bool to_info) {
     if (!currfuninfo) return;
     const PSN* psn = currfuninfo->begin_psn;
     const char* file = psn && psn->file ? psn->file : "NO_FILE";
-    debug_printf("\n========== FUNCTION %s() [%s:%ld] ==========\n", currfuninfo->name.c_str(), file, psn ? psn->line : 0L);
+    const long line = psn ? psn->line : 0;
+    debug_printf("\n========== FUNCTION %s() [%s:%ld] ==========\n", currfuninfo->name.c_str(), file, line);
+    if (to_info) info_printf("FUNCTION %s() [%s:%ld]\n", currfuninfo->name.c_str(), file, line);
 }
 
 // ---- The end of a body

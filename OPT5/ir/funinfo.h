@@ -194,6 +194,6 @@ void add_nonconforming_function(const SYMTAB* sym);
 void init_FUNINFO_flags(FUNINFO* f, int known_system);
 void unsuppress_inline_function(FUNINFO* f);
 void dump_FUNINFO(FUNINFO* f, int to_info); // to_info 0: the debug stream
-void dump_function_header();                // of the current function, to the debug and info streams
+void dump_function_header(bool to_info = false); // of the current function, to the debug stream, and the info stream on request
 void erase_all();                           // drops the current function's body
 bool sym_appears_in_EHT(const SYMTAB* sym); // of the current function

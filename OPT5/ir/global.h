@@ -40,7 +40,7 @@ extern std::vector<OPTION_SET> icode_optionlist; // as read from the input
 
 // Answers for the current function, or for the file when there is none.
 int opt_level();       // 0 to 4
-int size_speed_goal(); // 5 size is everything to 0, as the option's words say
+int size_speed_goal(); // from 0, size is everything, to 5, speed is
 long auto_inline();
 bool fp_add_is_associative();
 bool saturating_add_is_associative();

@@ -115,6 +115,7 @@ TEST(errors, trees) {
         tree("NAME of level 0, index 900 of 2", node(2, 1, by({0}) + un(900))),
         tree("NAME of level 2, index 5 of 0", node(2, 1, by({2, 5}))),
         tree("reference to label 4294967295", node(1, 0, un(UINT32_MAX))),
+        tree("FIELD of kind 2, expected 1", node(26, 1, by({2, 1, 1}))),
         tree("FIELD names type 1, which is no structure", node(26, 1, by({1, 1, 1}))),
         tree("FIELD names type 0, which is no structure", node(26, 1, by({1, 1, 0}))),
         tree("record of kind 101 (expression node): its payload ends 1 bytes before its frame", node(0, 1, "x")),

@@ -151,7 +151,7 @@ TEST_F(ReadTest, ABranchHintComesBackAsItWas) {
     EXPECT_NE(dump().find("__builtin_expect("), std::string::npos) << dump();
 }
 
-// ---- Input that is refused
+// ---- Functions that are refused
 
 TEST_F(ReadTest, LabelsMustBeDefinedOnce) {
     begin_main();
@@ -187,6 +187,64 @@ TEST_F(ReadTest, OnlyFunctionsHaveBodies) {
     end();
     expect_refusal("_v, which is no function");
 }
+// ---- One wrong tree each, in a function that is right otherwise
+
+class ShapeTest : public UnitTest {
+protected:
+    void refuses(IC_NODE* tree, const char* text) {
+        statement(tree);
+        ret(icon(0));
+        end();
+        expect_refusal(text);
+    }
+    ShapeTest() {
+        begin_main();
+        label(1);
+        i = pkg.int_t;
+    }
+    TYPE* i;
+};
+
+TEST_F(ShapeTest, ALabelIsNoValue) { refuses(node(op::PLUS, i, icon(1), ref(1)), "LABEL stands where a value must stand"); }
+TEST_F(ShapeTest, AValueIsNoLabel) {
+    refuses(node(op::CBRANCH, i, name(x), icon(1)), "ICON stands where a label must stand");
+}
+TEST_F(ShapeTest, ACaseStandsInASwitch) {
+    refuses(node(op::CASE, i, icon(1), ref(1)), "CASE stands where a statement must stand");
+}
+TEST_F(ShapeTest, TheDefaultIsLast) {
+    IC_NODE* list = node(op::COMMA, i, node(op::DEFAULT, i, ref(1)), node(op::CASE, i, icon(1), ref(1)));
+    refuses(node(op::SWITCH, i, name(x), list), "DEFAULT stands where a case list must stand");
+}
+TEST_F(ShapeTest, CasesAreConstants) {
+    refuses(node(op::SWITCH, i, name(x), node(op::CASE, i, name(y), ref(1))), "NAME stands where a case constant must stand");
+}
+TEST_F(ShapeTest, AConditionHasTwoArms) {
+    refuses(node(op::QUEST, i, name(x), icon(1)), "ICON stands where the arms of a condition must stand");
+}
+TEST_F(ShapeTest, ABranchIsNoOperand) {
+    refuses(node(op::COMMAOP, i, node(op::BRANCH, i, ref(1)), icon(1)), "BRANCH stands where a value must stand");
+}
+TEST_F(ShapeTest, AListIsNoValue) {
+    refuses(node(op::ASG, i, name(x), node(op::COMMA, i, icon(1), icon(2))), "COMMA stands where a value must stand");
+}
+TEST_F(ShapeTest, IndirectionNeedsAPointer) {
+    refuses(node(op::UMULT, i, name(x)), "an indirection through what is no pointer");
+}
+TEST_F(ShapeTest, ConstantsHaveTheirKindOfType) {
+    refuses(node(op::ASG, i, name(x), icon(1, pkg.float_t)), "a constant ICON of type float");
+}
+
+TEST_F(ReadTest, WhatAnEarlierRunLearnedOfAnAccessIsDropped) {
+    begin_main();
+    IC_NODE* access = node(119, pkg.int_t, name(x));
+    access->number = 4;
+    set(y, access);
+    ret(name(y));
+    end();
+    expect_lines({"y = x", "return y"});
+}
+
 TEST_F(ReadTest, ACallMustNameAnEntryOfTheTable) {
     IC_SYMBOL* f = global("_f", int_fn, 5);
     begin_main();

@@ -1,0 +1,204 @@
+// The shape of a tree just read: every node stands where its operator may stand, under operands that it can have.
+//
+// The I-file's records fix how many operands a node has, not what they are. What is refused here is what no parser writes
+// and what the optimizer could only misread: a label used as a value, a case outside a switch, an indirection through what
+// is no pointer. Afterwards the walkers of the optimizer may rely on the shapes.
+
+#include "OPT5/io/read_client.h"
+
+#include "OPT5/ir/node.h"
+
+#include <climits>
+
+namespace {
+
+enum class ROLE { statement, value, arguments, label, field, arms, cases, case_label };
+
+const char* role_text(ROLE role) {
+    switch (role) {
+    case ROLE::statement: return "a statement";
+    case ROLE::value: return "a value";
+    case ROLE::arguments: return "an argument";
+    case ROLE::label: return "a label";
+    case ROLE::field: return "a member";
+    case ROLE::arms: return "the arms of a condition";
+    case ROLE::cases: return "a case list";
+    case ROLE::case_label: return "a case constant";
+    }
+    return "";
+}
+
+[[noreturn]] void out_of_place(const NODE* t, ROLE role) {
+    refuse_input(std::string(t ? opname(t->op) : "nothing") + " stands where " + role_text(role) + " must stand");
+}
+
+bool is_statement_only(int op) {
+    switch (op) {
+    case RETURN:
+    case URETURN:
+    case SWITCH:
+    case BRANCH:
+    case CBRANCH:
+    case LOOP:
+    case ENDLOOP: return true;
+    default: return false;
+    }
+}
+
+// Operators that stand in one role and nowhere else.
+bool has_a_role_of_its_own(int op) {
+    switch (op) {
+    case LABELREF:
+    case FIELD:
+    case COLON:
+    case CASE:
+    case DEFAULT:
+    case COMMA:
+    case SKIP:
+    case ENDINIT: return true;
+    default: return false;
+    }
+}
+
+void check(const NODE* t, ROLE role);
+
+void check_arguments(const NODE* t) {
+    for (; t && t->op == COMMA; t = t->left) check(t->right, ROLE::value);
+    check(t, ROLE::value);
+}
+
+void check_case(const NODE* t, bool last) {
+    if (t && t->op == CASE) {
+        check(t->left, ROLE::case_label);
+        check(t->right, ROLE::label);
+    } else if (t && t->op == DEFAULT && last) {
+        check(t->left, ROLE::label);
+    } else
+        out_of_place(t, ROLE::cases);
+}
+
+void check_cases(const NODE* t) {
+    for (bool last = true;; last = false) {
+        if (!t || t->op != COMMA) {
+            check_case(t, last);
+            return;
+        }
+        check_case(t->right, last);
+        t = t->left;
+    }
+}
+
+void check_pointer(const NODE* t, const char* what) {
+    if (!t->left->type->is_pointer()) refuse_input(std::string(what) + " through what is no pointer");
+}
+
+void check_operands(const NODE* t) {
+    switch (t->op) {
+    case UMULT:
+        check(t->left, ROLE::value);
+        check_pointer(t, "an indirection");
+        return;
+    case STREF:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::field);
+        check_pointer(t, "a member is read");
+        return;
+    case STDOT:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::field);
+        return;
+    case QUEST:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::arms);
+        return;
+    case CALL:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::arguments);
+        return;
+    case ICALL:
+    case MCALL:
+    case MEMCPY:
+    case VPACK:
+    case VPACKM:
+    case ASSERT: check(t->left, ROLE::arguments); return;
+    case BRANCH: check(t->left, ROLE::label); return;
+    case CBRANCH:
+    case LOOP:
+    case ENDLOOP:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::label);
+        return;
+    case SWITCH:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::cases);
+        return;
+    default:
+        if (t->left) check(t->left, ROLE::value);
+        if (t->right) check(t->right, ROLE::value);
+        return;
+    }
+}
+
+void check_constant(const NODE* t) {
+    const TYPE* type = t->type->is_vector() ? t->type->raw_elem_type() : t->type;
+    const bool integer = type->is_int() || type->is_enum() || type->is_pointer() || type->is_fixed();
+    if (t->op == FCON ? !type->is_float() : !integer)
+        refuse_input(std::string("a constant ") + (t->op == FCON ? "FCON" : "ICON") + " of type " + t->type->printstr());
+}
+
+void check_value(const NODE* t, ROLE role) {
+    if (has_a_role_of_its_own(t->op) || (role != ROLE::statement && is_statement_only(t->op))) out_of_place(t, role);
+    switch (t->op) {
+    case NAME:
+        if (!t->u.sym) refuse_input("a NAME without a symbol");
+        break;
+    case ICON:
+    case FCON: check_constant(t); break;
+    case VREG: refuse_input("a virtual register in the input");
+    default: break;
+    }
+    check_operands(t);
+}
+
+void check(const NODE* t, ROLE role) {
+    if (!t) out_of_place(t, role);
+    if (t->op == EPVAL) { // a count on whatever it holds
+        check(t->left, role);
+        return;
+    }
+    switch (role) {
+    case ROLE::arguments: check_arguments(t); return;
+    case ROLE::cases: check_cases(t); return;
+    case ROLE::label:
+        if (t->op != LABELREF) out_of_place(t, role);
+        if (!t->u.lval.fits<int32_t>()) refuse_input("label number " + std::to_string(t->u.lval.value) + " is out of range");
+        return;
+    case ROLE::field:
+        if (t->op != FIELD || !t->mval) out_of_place(t, role);
+        return;
+    case ROLE::arms:
+        if (t->op != COLON) out_of_place(t, role);
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::value);
+        return;
+    case ROLE::case_label:
+        if (t->op != ICON) out_of_place(t, role);
+        check_constant(t);
+        return;
+    case ROLE::statement:
+    case ROLE::value: check_value(t, role); return;
+    }
+}
+
+} // namespace
+
+void check_statement(const NODE* tree) { check(tree, ROLE::statement); }
+
+void check_initializer_item(const NODE* tree) {
+    if (tree->op == ENDINIT) return;
+    if (tree->op == SKIP) {
+        if (tree->left) check(tree->left, ROLE::value);
+        return;
+    }
+    check(tree, ROLE::value);
+}

@@ -194,6 +194,7 @@ void I_FILE::if_skip_func() {
         cursor = limit;
     } while (kind != IFR_END_FUNC);
     level = 0;
+    in_back_end_function = false;
 }
 
 namespace {

@@ -5,7 +5,8 @@
 #include "IFILE/if_reader.h"
 
 void I_FILE::need_function(const char* what) const {
-    if (level == 0) bad_input("%s outside a function", what);
+    // A back-end function is none that a client could put anything in.
+    if (level == 0 || in_back_end_function) bad_input("%s outside a function", what);
 }
 
 void I_FILE::enter_function() {
@@ -13,6 +14,7 @@ void I_FILE::enter_function() {
     level = 1;
     locals.clear();
     eht_count = max_eh_entry = 0;
+    in_back_end_function = false;
 }
 
 void I_FILE::if_read_begin_func() {
@@ -66,6 +68,7 @@ void I_FILE::if_read_end_block() {
 void I_FILE::if_read_end_func() {
     PSN* psn = i_read_psn();
     end_record();
+    if (in_back_end_function) bad_input("end function inside a back-end function");
     if (level < 2) bad_input("end function before end of arguments");
     // Without a table the entries of calls mean nothing.
     if (eht_count && max_eh_entry > eht_count)
@@ -115,6 +118,7 @@ void I_FILE::if_read_ir_begin() {
     PSN* psn = i_read_psn();
     end_record();
     enter_function();
+    in_back_end_function = true;
     client->cl_ir_begin_func(a, b, c, d, psn);
 }
 
@@ -127,7 +131,8 @@ void I_FILE::if_read_ir() {
 void I_FILE::if_read_ir_end() {
     PSN* psn = i_read_psn();
     end_record();
-    need_function("end back-end function");
+    if (!in_back_end_function) bad_input("end back-end function outside one");
     client->cl_ir_end_func(psn);
+    in_back_end_function = false;
     level = 0;
 }

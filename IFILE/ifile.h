@@ -245,8 +245,9 @@ private:
     std::vector<OPEN_NODE> open_nodes;
     std::vector<bool> defined; // globals whose function or initializer has been read
     std::deque<PSN> psns;
-    uint32_t eht_count = 0;    // entries of the function's exception table
-    uint32_t max_eh_entry = 0; // highest entry that a call of the function names
+    uint32_t eht_count = 0;            // entries of the function's exception table
+    uint32_t max_eh_entry = 0;         // highest entry that a call of the function names
+    bool in_back_end_function = false; // the code generator's records have brackets of their own
     bool reading_unit = false;
 
     // ---- Writer state

@@ -74,6 +74,11 @@ IC_FACTS& IC_UNIT::add_facts(int kind, std::initializer_list<uint32_t> words, in
     return facts;
 }
 
+// Outside a function of the unit there are no locals: those of back-end functions are passed over.
+IC_SYMBOL* IC_UNIT::known(I_SYMTAB* sym) const {
+    return sym && (function_m || sym->sym_level() == 0) ? static_cast<IC_SYMBOL*>(sym) : nullptr;
+}
+
 BASE_NODE* IC_UNIT::new_node(int op, TYPE* type) {
     IC_NODE* node = new (arena_m.take(sizeof(IC_NODE))) IC_NODE(&arena_m);
     node->op = op;
@@ -168,7 +173,7 @@ void IC_UNIT::cl_loop_def(uint32_t id, uint32_t outer, uint32_t min, uint32_t ma
 }
 
 void IC_UNIT::cl_loop_header(uint32_t id, I_SYMTAB* lcv, uint8_t flags) {
-    add_facts(IFR_LOOP_VAR, {id}, flags).sym = static_cast<IC_SYMBOL*>(lcv);
+    add_facts(IFR_LOOP_VAR, {id}, flags).sym = known(lcv);
 }
 
 void IC_UNIT::cl_dd_vector(uint32_t id, uint8_t flags, uint32_t count, const uint16_t* elements) {
@@ -186,13 +191,13 @@ void IC_UNIT::cl_mbank(uint32_t a, uint32_t b, uint32_t c, uint32_t d, uint32_t 
 void IC_UNIT::cl_ldspec_induct(uint32_t id, uint32_t word, int32_t step, TYPE* type, I_SYMTAB* sym) {
     IC_FACTS& facts = add_facts(IFR_LDSPEC, {id, word, static_cast<uint32_t>(step)}, 0);
     facts.type = type;
-    facts.sym = static_cast<IC_SYMBOL*>(sym);
+    facts.sym = known(sym);
 }
 
 void IC_UNIT::cl_ldspec_rand(uint32_t id, uint32_t word, uint32_t word2, TYPE* type, I_SYMTAB* sym) {
     IC_FACTS& facts = add_facts(IFR_LDSPEC, {id, word, word2}, 1);
     facts.type = type;
-    facts.sym = static_cast<IC_SYMBOL*>(sym);
+    facts.sym = known(sym);
 }
 
 void IC_UNIT::cl_ldspec_region(uint32_t id, uint32_t label) { add_facts(IFR_LDSPEC, {id, label}, 2); }

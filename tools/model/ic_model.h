@@ -255,6 +255,7 @@ public:
     void cl_ir_ins(PSN*) override {}
 
 private:
+    IC_SYMBOL* known(I_SYMTAB* sym) const;
     IC_ITEM& add(int kind, PSN* psn = nullptr);
     IC_FACTS& add_facts(int kind, std::initializer_list<uint32_t> words, int flags = 0);
     void write_item(I_FILE* out, const IC_ITEM& item);

@@ -92,6 +92,11 @@ void check_pointer(const NODE* t, const char* what) {
     if (!t->left->type->is_pointer()) refuse_input(std::string(what) + " through what is no pointer");
 }
 
+// What is true or false is a scalar, or a mask of truth values.
+void check_truth_value(const NODE* t) {
+    if (!t->type->is_scalar() && !t->type->is_vector()) refuse_input("the truth of a " + t->type->printstr());
+}
+
 void check_operands(const NODE* t) {
     switch (t->op) {
     case UMULT:
@@ -110,6 +115,18 @@ void check_operands(const NODE* t) {
     case QUEST:
         check(t->left, ROLE::value);
         check(t->right, ROLE::arms);
+        check_truth_value(t->left);
+        return;
+    case ANDAND:
+    case OROR:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::value);
+        check_truth_value(t->left);
+        check_truth_value(t->right);
+        return;
+    case EXCLAIM:
+        check(t->left, ROLE::value);
+        check_truth_value(t->left);
         return;
     case CALL:
         check(t->left, ROLE::value);
@@ -123,6 +140,10 @@ void check_operands(const NODE* t) {
     case ASSERT: check(t->left, ROLE::arguments); return;
     case BRANCH: check(t->left, ROLE::label); return;
     case CBRANCH:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::label);
+        check_truth_value(t->left);
+        return;
     case LOOP:
     case ENDLOOP:
         check(t->left, ROLE::value);
@@ -131,6 +152,7 @@ void check_operands(const NODE* t) {
     case SWITCH:
         check(t->left, ROLE::value);
         check(t->right, ROLE::cases);
+        if (!t->left->type->is_int() && !t->left->type->is_enum()) refuse_input("a switch on what is no integer");
         return;
     default:
         if (t->left) check(t->left, ROLE::value);

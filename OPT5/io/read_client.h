@@ -56,6 +56,7 @@ private:
 
     void append(NODE* tree, PSN* psn);
     void note_label(uint32_t label);
+    void note_references(const NODE* tree);
     void make_ptr_entries(const SYMTAB* outer);
     void close_scope(PSN* psn);
     void apply_function_pragma(SYMTAB* sym, const PRAGMA& pragma);
@@ -64,6 +65,8 @@ private:
 
     std::vector<SCOPE_RECORD> open_scopes;
     std::unordered_set<uint32_t> labels; // defined in the function so far
+    std::vector<uint32_t> labels_named;  // by its statements
+    bool has_exception_entries = false;  // some call names one
     int64_t next_depnum = 0;
 };
 

@@ -55,6 +55,7 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
     auto* tree = static_cast<NODE*>(base);
     if (lex == 0) refuse_input("a statement stands outside a function");
     check_statement(tree);
+    note_references(tree);
     // What the head of a counted loop evaluates stays as a statement ahead of the loop's label.
     if (tree->op == LOOP && tree->left && tree_has_side_effects(tree->left)) {
         NODE* start = tree->left;
@@ -65,6 +66,14 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
     if (tree->op == LABELDEF) note_label(static_cast<uint32_t>(tree->lbl->index)); // the head of a counted loop
     LS::initialize_scopes_and_ptrs_from_tree(tree);
     append(tree, psn);
+}
+
+// What the end of the function has to look up; noted while the tree is at hand.
+void OPT_CLIENT::note_references(const NODE* tree) {
+    for_each_node(const_cast<NODE*>(tree), [this](const NODE* t) {
+        if (t->op == LABELREF) labels_named.push_back(t->label_id());
+        if (t->eh_entry) has_exception_entries = true;
+    });
 }
 
 void OPT_CLIENT::note_label(uint32_t label) {
@@ -133,6 +142,8 @@ void OPT_CLIENT::cl_begin_func(I_SYMTAB* isym, PSN* psn) {
     f->no_calls = true;
     open_scopes.clear();
     labels.clear();
+    labels_named.clear();
+    has_exception_entries = false;
     next_depnum = 0;
     lex = 1;
     if (sym->cqual & CQ_INTERRUPT) set_flags(f, FUN_is_interrupt);
@@ -195,6 +206,7 @@ bool OPT_CLIENT::cl_func_eht(EHT_ENTRY* entries, uint32_t count) {
         item.next_entry = e.next;
         if (e.cleanup) {
             check_statement(static_cast<NODE*>(e.cleanup));
+            note_references(static_cast<NODE*>(e.cleanup));
             item.cleanup = expr_cleanup(static_cast<NODE*>(e.cleanup));
             LS::initialize_scopes_and_ptrs_from_tree(item.cleanup);
         }
@@ -260,21 +272,22 @@ void size_site_sets(FUNINFO* f) {
 // call names must stand in the table. A function without a table has no entries.
 void OPT_CLIENT::check_references() {
     FUNINFO* f = currfuninfo;
-    const size_t entries = f->eht.size();
     auto check_label = [this](int64_t label) {
         if (!labels.count(static_cast<uint32_t>(label))) refuse_input("label " + std::to_string(label) + " is not defined");
     };
-    for_each_raw_tree(f, [&](NODE* tree) {
-        for_each_node(tree, [&](NODE* t) {
-            if (t->op == LABELREF && !t->lbl) check_label(t->u.lval.fits_in<int64_t>());
+    for (uint32_t label : labels_named) check_label(label);
+    for (const EHT_ITEM& item : f->eht)
+        for (const EHT_CATCH& c : item.catches) check_label(c.label);
+    if (!has_exception_entries) return;
+    const size_t entries = f->eht.size();
+    for_each_raw_tree(f, [=](NODE* tree) {
+        for_each_node(tree, [=](NODE* t) {
             if (!op_is_call(t->op)) return;
             if (entries <= 1) t->eh_entry = 0;
-            if (t->eh_entry && t->eh_entry >= entries)
+            if (t->eh_entry >= std::max<size_t>(entries, 1))
                 refuse_input("a call names exception entry " + std::to_string(t->eh_entry));
         });
     });
-    for (const EHT_ITEM& item : f->eht)
-        for (const EHT_CATCH& c : item.catches) check_label(c.label);
 }
 
 // A structure returned through a hidden pointer: the copy of that parameter never changes and is never null.
@@ -324,7 +337,7 @@ void OPT_CLIENT::cl_end_func(PSN* psn) {
     check_for_synonym_function_in_pass_1();
     check_integrable_definition();
     add_return_pointer_assertion();
-    seq_trees();
+    seq_trees(opt_level() >= 2 ? propagate_global_constants : nullptr);
     buildcfg();
     simpcfg(0, 0);
     fast_CP(4, 1);

@@ -78,15 +78,29 @@ LBL* label_of_bb(BBLK* bb) {
     return bb->label;
 }
 
-void recount_label_references() {
+namespace {
+
+// The control statement of every block in list order. A block's list is walked to its end to find it, which is what
+// costs: callers that look twice keep the result.
+std::vector<NODE*> collect_branches() {
+    std::vector<NODE*> branches;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (NODE* branch = bb->branch()) branches.push_back(branch);
+    return branches;
+}
+
+void recount(const std::vector<NODE*>& branches) {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LBL* lbl = bb->label; lbl; lbl = lbl->next) lbl->refcount = 0;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        if (NODE* branch = bb->branch())
-            for_each_branch_target(branch, [](NODE* ref) {
-                if (ref->lbl) ++ref->lbl->refcount;
-            });
+    for (NODE* branch : branches)
+        for_each_branch_target(branch, [](NODE* ref) {
+            if (ref->lbl) ++ref->lbl->refcount;
+        });
 }
+
+} // namespace
+
+void recount_label_references() { recount(collect_branches()); }
 
 // ---- Blocks
 
@@ -185,16 +199,15 @@ bool BB_is_in_bb_list(const BBLK* bb) {
 namespace {
 
 // Labels that a branch names get their place in block order as number, so that output and dumps read in order.
-void renumber_labels() {
+void renumber_labels(const std::vector<NODE*>& branches) {
     int32_t running = 0;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LBL* lbl = bb->label; lbl; lbl = lbl->next)
             if (lbl->refcount) lbl->index = ++running;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        if (NODE* branch = bb->branch())
-            for_each_branch_target(branch, [](NODE* ref) {
-                if (ref->lbl) ref->u.lval = INT65(ref->lbl->index);
-            });
+    for (NODE* branch : branches)
+        for_each_branch_target(branch, [](NODE* ref) {
+            if (ref->lbl) ref->u.lval = INT65(ref->lbl->index);
+        });
 }
 
 // No path leaves a function in which every block has a successor.
@@ -218,8 +231,9 @@ void renumber_bblocks() {
     }
     if (currfuninfo->bb_list) currfuninfo->bb_list->rdflink = previous;
     currfuninfo->bb_count = n;
-    recount_label_references();
-    renumber_labels();
+    const std::vector<NODE*> branches = collect_branches();
+    recount(branches);
+    renumber_labels(branches);
     if (n) note_endless_function();
 }
 

@@ -27,6 +27,7 @@ public:
         ::operator delete(p);
 #else
         cell* c = static_cast<cell*>(p);
+        if (!head) tail = c;
         c->next = head;
         head = c;
 #endif
@@ -39,14 +40,14 @@ private:
     static constexpr std::size_t CELLS_A_BLOCK = 512;
     static_assert(Size >= sizeof(cell) && Size % alignof(cell) == 0);
 
-    // Gives the cells of an ending thread to the others.
+    // Gives the cells of an ending thread to the others. `tail` is the last cell of the thread's list: the one that came
+    // when the list was empty, since cells come and go at the head.
     struct leaver {
         ~leaver() {
             if (!head) return;
-            cell* last = head;
-            while (last->next) last = last->next;
             std::lock_guard<std::mutex> guard(lock);
-            last->next = left_over;
+            tail->next = left_over;
+            if (!left_over) left_over_tail = tail;
             left_over = head;
             head = nullptr;
         }
@@ -58,6 +59,7 @@ private:
         {
             std::lock_guard<std::mutex> guard(lock);
             head = left_over;
+            tail = left_over_tail;
             left_over = nullptr;
         }
         if (head) return;
@@ -66,6 +68,8 @@ private:
     }
 
     static inline thread_local cell* head = nullptr;
+    static inline thread_local cell* tail = nullptr; // valid while `head` is not null
     static inline cell* left_over = nullptr;
+    static inline cell* left_over_tail = nullptr;
     static inline std::mutex lock;
 };

@@ -23,9 +23,14 @@ constexpr int ASM_COMMENT = 47;
 
 class SEQUENCER {
 public:
-    SEQUENCER(LIST** statement_list, PSN* position) : out(statement_list), psn(position) {}
+    // `simplified`: the tree that `statement` is first given has been through the simplifier as it stands.
+    SEQUENCER(LIST** statement_list, PSN* position, bool simplified)
+        : out(statement_list), psn(position), is_simplified(simplified) {}
 
     void statement(NODE* t) {
+        const bool takes_apart = t->op == QUEST || t->op == ANDAND || t->op == OROR || t->op == COMMAOP || t->op == PLUSPLUS ||
+                                 t->op == MINMIN || t->op == CBRANCH;
+        if (takes_apart) is_simplified = false;
         switch (t->op) {
         case QUEST: conditional(t); break;
         case ANDAND:
@@ -69,7 +74,8 @@ private:
     // What transfers control, or stands for itself, is simplified and kept; of anything else the effects are.
     void plain(NODE* t) {
         const bool keeps = side_effects[t->op] == 2 || t->op == PPRAGMA || t->op == ASM || tree_is_arg_prolog(t);
-        t = simp_tree(t, nullptr);
+        if (!is_simplified) t = simp_tree(t, nullptr);
+        is_simplified = false;
         if (t && !keeps) {
             if (t->op == COMMAOP || t->op == QUEST || t->op == ANDAND || t->op == OROR) {
                 statement(t);
@@ -187,6 +193,7 @@ private:
 
     LIST** out;
     PSN* psn;
+    bool is_simplified;
     LS* scope = nullptr;
 };
 
@@ -226,9 +233,9 @@ void dispatch_behind(NODE* t, LIST** out, PSN* psn) {
 
 } // namespace
 
-void sequence_tree(NODE* tree, LIST** list, PSN* psn) { SEQUENCER(list, psn).statement(tree); }
+void sequence_tree(NODE* tree, LIST** list, PSN* psn, bool simplified) { SEQUENCER(list, psn, simplified).statement(tree); }
 
-void seq_trees() {
+void seq_trees(NODE* (*prepare)(NODE*)) {
     FUNINFO* f = currfuninfo;
     LIST* raw = reverse_list(f->statements);
     const bool catches = f->has_eh();
@@ -240,7 +247,8 @@ void seq_trees() {
         PSN* psn = cell->psn;
         delete cell;
         LIST* before = out;
-        sequence_tree(t, &out, psn);
+        if (prepare) t = prepare(t);
+        sequence_tree(t, &out, psn, !prepare);
         if (out == before) continue;
         if (is_call_that_never_returns(out->first))
             end_flow_behind(&out, psn);

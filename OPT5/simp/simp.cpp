@@ -95,17 +95,27 @@ NODE* simp_node(NODE* t, struct LOOP* loop) {
     }
 }
 
-NODE* simp_tree(NODE* t, struct LOOP* loop) {
-    if (!t) return t;
-    // An assertion is not simplified by what it says itself.
+namespace {
+
+// An assertion is not simplified by what it says itself.
+NODE* simp_assertion(NODE* t, struct LOOP* loop) {
     std::vector<NODE*> givens;
-    bool is_assertion = t->op == ASSERT && currfuninfo;
-    if (is_assertion) std::swap(givens, currfuninfo->givens);
+    if (currfuninfo) std::swap(givens, currfuninfo->givens);
     t->left = simp_tree(t->left, loop);
     t->right = simp_tree(t->right, loop);
     t = simp_node(t, loop);
-    if (is_assertion) std::swap(givens, currfuninfo->givens);
+    if (currfuninfo) std::swap(givens, currfuninfo->givens);
     return t;
+}
+
+} // namespace
+
+NODE* simp_tree(NODE* t, struct LOOP* loop) {
+    if (!t) return t;
+    if (t->op == ASSERT) return simp_assertion(t, loop);
+    if (t->left) t->left = simp_tree(t->left, loop);
+    if (t->right) t->right = simp_tree(t->right, loop);
+    return simp_node(t, loop);
 }
 
 void simp_all_trees() {

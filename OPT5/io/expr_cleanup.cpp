@@ -227,7 +227,7 @@ TYPE* function_type_of_call(const NODE* call) {
         parm->next = params;
         params = parm;
     }
-    TYPE* type = tp->mk_func(call->type, false, false, true, 0, tp->void_ptr_t->size, tp->void_ptr_t->align);
+    TYPE* type = tp->mk_func(call->type, false, false, true, 0, 0, 0);
     tp->set_params(type, params);
     tp->type_frozen(type);
     return type;

@@ -197,18 +197,30 @@ void write_func_body() {
 
 namespace {
 
-// One walk over what will be written: which locals it names, and whether it calls. The count of uses stops at 1, since
-// the word is narrow and only zero matters.
+// The object that an address is taken of, or null.
+SYMTAB* addressed_object(const NODE* t) {
+    if (t->op != UAND && t->op != ARGREF) return nullptr;
+    for (t = t->left; t && t->op == STDOT;) t = t->left;
+    return t && t->op == NAME ? t->u.sym : nullptr;
+}
+
+// One walk over what will be written: which locals it names and which have their address taken, and whether it calls.
+// The count of uses stops at 1, since the word is narrow and only zero matters.
 void survey(FUNINFO* f) {
     for (SYMTAB* list : {f->scalar_syms, f->memory_syms, f->new_syms, f->pending_syms})
         for (SYMTAB* s = list; s; s = s->next)
-            if (s->level == 2) s->set_bitnum(0);
+            if (s->level == 2) {
+                s->set_bitnum(0);
+                s->set_is_aliased(false);
+            }
     calls_are_written = false;
     auto visit = [](NODE* t) {
         if (t->op == NAME && t->u.sym->level == 2)
             t->u.sym->set_bitnum(1);
         else if (op_is_call(t->op))
             calls_are_written = true;
+        else if (SYMTAB* object = addressed_object(t); object && object->level == 2)
+            object->set_is_aliased(true);
     };
     for_each_tree(f, [&](NODE* tree) { for_each_node(tree, visit); });
     for (EHT_ITEM& item : f->eht) for_each_node(item.cleanup, visit);

@@ -92,6 +92,21 @@ TEST_F(WriteTest, ParametersKeepTheirOrderAndUnusedLocalsGo) {
     EXPECT_EQ(text.find("b: long, class 1,"), std::string::npos) << "the copy of b was not used";
 }
 
+// What has an address stays in memory.
+TEST_F(WriteTest, OnlyLocalsWithoutAnAddressAreRegisterVariables) {
+    IC_SYMBOL* f = global("_f", function_type({pkg.mk_ptr(pkg.int_t)}, pkg.int_t), 5);
+    begin_main();
+    set(x, icon(3));
+    set(y, call(f, node(op::UAND, pkg.mk_ptr(pkg.int_t), name(x))));
+    ret(name(y));
+    end();
+    const RESULT r = optimize({"--opt_level=off"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const std::string text = dump();
+    EXPECT_NE(text.find("x: int, class 1,"), std::string::npos) << text;
+    EXPECT_NE(text.find("y: int, class 22,"), std::string::npos) << text;
+}
+
 TEST_F(WriteTest, DeclaredTypesComeBack) {
     TYPE* color = pkg.mk_enum("color", pkg.int_t, 16, 16, false);
     auto* red = new fkETOR;

@@ -1,0 +1,94 @@
+#!/usr/bin/env python3
+"""Checks the .expected files by another compiler: clang for a processor whose int has 16 bits, run on the host.
+
+clang lowers each program to its intermediate form for that processor, so that every width, promotion and conversion is
+decided for a 16-bit int; the form is then compiled for the host and linked to printing functions of its own. char is
+made 16 bits wide and double single precision by respelling them. Programs that need the width of pointers, variable
+arguments or the library cannot be judged so; they say "no crosscheck" in a comment.
+Not part of the default tests, since it needs clang and llc of one version:  crosscheck.py [NAME]...
+"""
+import re
+import subprocess
+import sys
+import tempfile
+from pathlib import Path
+
+HERE = Path(__file__).resolve().parent
+
+# What the language leaves undefined stops a program here: a test must not rest on it.
+UNDEFINED = "signed-integer-overflow,shift,integer-divide-by-zero,bounds,float-cast-overflow,unreachable,return,null"
+PRINT = r"""
+#include <stdint.h>
+#include <stdio.h>
+#include <string.h>
+void put_i16(int v) { printf("%d\n", (int16_t)v); }
+void put_i32(int v) { printf("%d\n", v); }
+void put_u32(unsigned v) { printf("%u\n", v); }
+void put_i64(long long v) { printf("%lld\n", v); }
+void put_f32(float v) { printf("%.9g\n", v); }
+void put_f64(double v) { printf("%.17g\n", v); }
+void put_str(const PUTCHAR *s) { while (*s) putchar(*s++); putchar('\n'); }
+short program_main(void);
+int main(void) { return (unsigned char)program_main(); }
+"""
+DECLARE = """
+void put_i16(int); void put_i32(long); void put_u32(unsigned long); void put_i64(long long);
+void put_f32(float); void put_f64(LONG_DOUBLE); void put_str(const char *);
+"""
+
+
+def for_host(source):
+    """The program's text with the target's char and double spelled in types of the other processor."""
+    text = re.sub(r"#include <(zrun|string|stdlib|math|stdint)\.h>", "", source)
+    text = DECLARE + text
+    text = re.sub(r"\blong\s+double\b", "LONG_DOUBLE", text)
+    text = re.sub(r"\bdouble\b", "float", text).replace("LONG_DOUBLE", "double")
+    if '"' not in re.sub(r"'\"'", "", text):
+        text = re.sub(r"\bchar\b", "short", text)
+    return re.sub(r"\bmain\b", "program_main", text)
+
+
+def command(*words):
+    subprocess.run([str(word) for word in words], check=True)
+
+
+def printed(source, folder):
+    folder = Path(folder)
+    (folder / "p.c").write_text(for_host(source.read_text()))
+    (folder / "print.c").write_text(PRINT)
+    command("clang", "-target", "msp430", "-std=c99", "-w", "-O0", "-ffp-contract=off", "-fno-builtin", "-fsigned-char",
+            f"-fsanitize={UNDEFINED}", f"-fsanitize-trap={UNDEFINED}",
+            "-S", "-emit-llvm", folder / "p.c", "-o", folder / "p.ll")
+    form = (folder / "p.ll").read_text()
+    form = re.sub(r"^target (datalayout|triple).*$", "", form, flags=re.M)
+    form = re.sub(r"^attributes .*$", lambda line: re.sub(r'"target-[a-z]+"="[^"]*"', "", line[0]), form, flags=re.M)
+    (folder / "p.ll").write_text('target triple = "x86_64-pc-linux-gnu"\n' + form)
+    char = "short" if "char" not in (folder / "p.c").read_text() else "char"
+    command("llc", "-O0", "-relocation-model=pic", "-filetype=obj", folder / "p.ll", "-o", folder / "p.o")
+    command("clang", "-w", f"-DPUTCHAR={char}", folder / "print.c", folder / "p.o", "-lm", "-o", folder / "p")
+    return subprocess.run([folder / "p"], stdout=subprocess.PIPE, check=True, timeout=60).stdout.decode()
+
+
+def main():
+    failed = 0
+    sources = [path for path in sorted(HERE.glob("*.c")) if not sys.argv[1:] or path.stem in sys.argv[1:]]
+    for source in sources:
+        if "no crosscheck" in source.read_text():
+            print(f"skip {source.stem}")
+            continue
+        try:
+            with tempfile.TemporaryDirectory() as folder:
+                got = printed(source, folder).splitlines()
+        except subprocess.SubprocessError as error:
+            got = [str(error)]
+        want = source.with_suffix(".expected").read_text().splitlines()
+        if got != want:
+            failed += 1
+            first = next((n for n, (a, b) in enumerate(zip(want, got)) if a != b), min(len(want), len(got)))
+            print(f"FAIL {source.stem}: line {first + 1}: {got[first:first + 1]} instead of {want[first:first + 1]}")
+    print(f"{len(sources)} programs, {failed} differ")
+    return 1 if failed else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

@@ -1,0 +1,96 @@
+#!/usr/bin/env python3
+"""Whole programs: each must print the same before and after optimization.
+
+Every tests/programs/NAME.c is parsed and executed, and must print NAME.expected. It is then optimized at every level
+and at both ends of the size goal, with the checker between steps, executed and compared. What was optimized is
+optimized once more: an output is a valid input, and must still print the same.
+"""
+import argparse
+import sys
+import tempfile
+from concurrent.futures import ThreadPoolExecutor
+from pathlib import Path
+
+HERE = Path(__file__).resolve().parent
+sys.path.insert(0, str(HERE.parent.parent / "tools"))
+from zbench import Outcome, Tools, Trouble, difference  # noqa: E402
+
+LEVELS = ("off", "0", "1", "2", "3", "4")
+SIZE_GOALS = ("0", "5")
+CHECK = "--debug:validate"
+
+
+def variants(levels):
+    """(name, option words) of each way a program is optimized."""
+    for level in levels:
+        yield f"level {level}", [f"--opt_level={level}", CHECK]
+    if "2" in levels:
+        for goal in SIZE_GOALS:
+            yield f"level 2 goal {goal}", ["--opt_level=2", f"--size_speed_goal={goal}", CHECK]
+
+
+def judge_variant(tools, unit, want, name, words):
+    """Failures of one program optimized by `words`, twice in a row. `unit` stays as it is."""
+    source = unit
+    for round_ in ("", " again"):
+        out = unit.with_name(f"{unit.stem}-{name.replace(' ', '-')}{round_.replace(' ', '-')}.if")
+        try:
+            tools.optimize(source, out, words)
+            found = difference(want, tools.execute(out))
+        except Trouble as trouble:
+            found = str(trouble)
+        if found:
+            return [f"{name}{round_}: {found}"]
+        source = out
+    return []
+
+
+def judge_program(tools, source, levels, folder):
+    """All failures of one program, each a line of text; none when it passes."""
+    want = Outcome(0, source.with_suffix(".expected").read_text())
+    unit = Path(folder) / f"{source.stem}.if"
+    try:
+        tools.parse(source, unit)
+        found = difference(want, tools.execute(unit))
+    except Trouble as trouble:
+        found = str(trouble)
+    if found:
+        return [f"unoptimized: {found}"]
+    failures = []
+    for name, words in variants(levels):
+        failures += judge_variant(tools, unit, want, name, words)
+    return failures
+
+
+def chosen(only, shard):
+    """The programs to run: those whose name contains `only`, of these each COUNT-th from INDEX on."""
+    programs = [source for source in sorted(HERE.glob("*.c")) if not only or any(word in source.stem for word in only)]
+    index, count = (int(part) for part in shard.split("/"))
+    return programs[index::count]
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__.splitlines()[0])
+    Tools.add_options(parser)
+    parser.add_argument("--jobs", type=int, default=2, help="programs at the same time (2)")
+    parser.add_argument("--only", action="append", metavar="NAME", help="programs whose name contains NAME; repeatable")
+    parser.add_argument("--levels", default=" ".join(LEVELS), help="levels to optimize at (all)")
+    parser.add_argument("--shard", default="0/1", metavar="INDEX/COUNT", help="a part of the programs, from 0/COUNT on")
+    options = parser.parse_args()
+    tools, levels = Tools.of(options), options.levels.replace(",", " ").split()
+    programs = chosen(options.only, options.shard)
+    if not programs:
+        sys.exit("no program is chosen")
+    failed = 0
+    with tempfile.TemporaryDirectory() as folder, ThreadPoolExecutor(options.jobs) as pool:
+        results = pool.map(lambda source: judge_program(tools, source, levels, folder), programs)
+        for source, failures in zip(programs, results):
+            failed += bool(failures)
+            for failure in failures:
+                print(f"FAIL {source.stem}: {failure}", flush=True)
+    print(f"{len(programs) - failed} passed, {failed} failed")
+    return 1 if failed else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

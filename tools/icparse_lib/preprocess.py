@@ -1,0 +1,76 @@
+"""From a source file to a syntax tree: the C preprocessor, a few rewrites that the parser library needs, the parser."""
+import os
+import re
+import subprocess
+
+from pycparser import c_parser
+
+from .errors import CompileError, Position
+
+HEADERS = os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "include")
+
+ASM = re.compile(r"\b(?:asm|__asm__|__asm)(?:\s+(?:volatile|__volatile__))?\s*(?=\()")
+TOKEN = re.compile(r'"(?:\\.|[^"\\\n])*"|\'(?:\\.|[^\'\\\n])*\'|^\#[^\n]*|[{}\n]|\b(?:__asm__|__asm|asm)\b', re.M)
+LINE_MARKER = re.compile(r'#\s*(?:line\s+)?(\d+)\s+"((?:\\.|[^"\\])*)"')
+PARSE_ERROR = re.compile(r"(.*?):(\d+):(?:(\d+):)?\s*(.*)", re.S)
+CPP_ERROR = re.compile(r"^(.*?):(\d+):(\d+): (?:fatal )?error: (.*)$", re.M)
+
+PREDEFINED = ("__ZELKOVA__=1", "__signed__=signed", "__inline=inline", "__inline__=inline", "__restrict=restrict",
+              "__restrict__=restrict", "__const=const", "__volatile=volatile", "__extension__=")
+
+
+def preprocess(path, include_dirs, defines, eabi):
+    """The preprocessed text; `defines` are NAME or NAME=VALUE."""
+    command = ["cpp", "-std=c99", "-undef", "-nostdinc", "-pipe"]
+    command += [f"-D{d}" for d in (*PREDEFINED, f"__ZELKOVA_EABI__={int(eabi)}", *defines)]
+    command += [f"-I{d}" for d in include_dirs] + ["-isystem", HEADERS, path]
+    try:
+        result = subprocess.run(command, capture_output=True, check=False, encoding="utf-8", errors="surrogateescape")
+    except FileNotFoundError as missing:
+        raise CompileError(None, "the C preprocessor `cpp` is not installed") from missing
+    if result.returncode:
+        found = CPP_ERROR.search(result.stderr)
+        if found:
+            raise CompileError(Position(found[1], int(found[2]), int(found[3])), found[4])
+        raise CompileError(None, result.stderr.strip() or "the preprocessor failed")
+    return result.stdout
+
+
+def lift_file_scope_asm(text):
+    """`asm("...");` outside functions becomes a pragma line, which the parser library takes there."""
+    out, last, depth, line, file = [], 0, 0, 1, ""
+    for token in TOKEN.finditer(text):
+        word = token[0]
+        if word == "\n":
+            line += 1
+        elif word[0] == "#":
+            marker = LINE_MARKER.match(word)
+            if marker:
+                line, file = int(marker[1]) - 1, marker[2]
+        elif word in "{}":
+            depth += 1 if word == "{" else -1
+        elif depth == 0 and word.strip("_") == "asm" and token.start() >= last:
+            found = re.compile(r'\w+\s*(?:volatile\s*)?\(((?:\s*"(?:\\.|[^"\\])*")+)\s*\)\s*;').match(text, token.start())
+            if found:
+                after = line + found[0].count("\n")
+                strings = " ".join(found[1].split("\n"))
+                out.append(text[last:token.start()] + f'\n#pragma ASM_TEXT {strings}\n# {after} "{file}"\n')
+                last = found.end()
+    return "".join(out) + text[last:]
+
+
+def parse(path, include_dirs, defines, eabi):
+    """The syntax tree of a source file."""
+    if not os.path.isfile(path):
+        raise CompileError(None, f"cannot read {path}")
+    text = preprocess(path, include_dirs, defines, eabi)
+    if "asm" in text:
+        text = ASM.sub(lambda m: "asm" + " " * (len(m[0]) - 3), lift_file_scope_asm(text))
+    try:
+        return c_parser.CParser().parse(text, path)
+    except c_parser.ParseError as error:
+        found = PARSE_ERROR.match(str(error))
+        if not found:
+            raise CompileError(None, str(error)) from error
+        what = found[4].replace("before:", "syntax error before")
+        raise CompileError(Position(found[1], int(found[2]), int(found[3] or 0)), what) from error

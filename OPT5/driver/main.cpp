@@ -13,6 +13,7 @@
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/md/matcher.h"
+#include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 #include "OPT5/target/target.h"
 #include "TYPES/type.h"
@@ -44,6 +45,7 @@ bool optimize_unit(int argc, char** argv) {
     init_symbols();
     init_fileopts();
     init_BIF_descriptors();
+    init_simplifier();
     setup_passes(true);
     if (pass_debug_parser) {
         parse_md_file(false);

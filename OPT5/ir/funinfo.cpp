@@ -99,7 +99,8 @@ FUNINFO* create_funinfo(const char* name, SYMTAB* sym, int known_system) {
     auto* f = new FUNINFO(name);
     f->symbol = sym;
     f->uid = ++uid_counter;
-    f->simd_allowed = pass_debug_SIMD != 0;
+    constexpr int VECTORIZE_ON = 50;
+    f->simd_allowed = pass_debug_SIMD || (file_options && file_options->getnumarg(option_obj::OO_vectorize) == VECTORIZE_ON);
     init_FUNINFO_flags(f, known_system);
     fileinfo.FUNLIST.push_back(f);
     funinfo_by_name.emplace(skip_name_prefix(name), f);

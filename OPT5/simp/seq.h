@@ -4,16 +4,17 @@
 class NODE;
 struct LIST;
 
-// Runs once per function, after the first simplification and before `buildcfg`, on FUNINFO::statements (last first), which
-// have been simplified as they stand. `prepare`, where not null, is applied to each tree first. Afterwards no statement is a QUEST, ANDAND, OROR, COMMAOP, CBRANCH or an increment, and every IF names both targets.
+// Runs once per function, after the first simplification and before `buildcfg`, on FUNINFO::statements (last first),
+// which have been simplified as they stand. `prepare`, where not null, is applied to each tree first. Afterwards no
+// statement is a QUEST, ANDAND, OROR, COMMAOP, CBRANCH or an increment, and every IF names both targets.
 void seq_trees(NODE* (*prepare)(NODE*) = nullptr);
 
 // Sequences one tree behind the statements of `*list` (last first), each new cell with the position `psn`. `simplified`
 // says that the tree has been through the simplifier as it stands.
 void sequence_tree(NODE* tree, LIST** list, struct PSN* psn, bool simplified = false);
 
-// The statement that stands for the dispatch of an exception behind a call: a SWITCH on a magic call whose cases lead to
-// the handlers. It keeps the handlers reachable while the function is optimized and is not written out.
+// The statement that stands for the dispatch of an exception behind a call: a SWITCH on a magic call whose cases lead
+// to the handlers. It keeps the handlers reachable while the function is optimized and is not written out.
 NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through);
 bool tree_is_EH_SWITCH(const NODE* tree);
 // Records where the cases of a dispatch lead in the catch clauses of the current function.

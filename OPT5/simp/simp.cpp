@@ -1,5 +1,7 @@
 // The dispatch of the simplifier: from the opcode to the rules that apply to it.
 
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/simp.h"
 
 #include "OPT5/ir/bblk.h"
@@ -33,14 +35,15 @@ NODE* simp_EXCLAIM(NODE* t) {
 
 // A cast to the type that the value has. A bit-field keeps its cast.
 NODE* simp_SCONV(NODE* t) {
-    if (t->left->op == STDOT || t->left->op == STREF || !compatible_types(t->type, t->left->type, true)) return t;
+    if (t->left->op == STDOT || t->left->op == STREF) return t;
+    if (!compatible_types(t->type, t->left->type, true)) return simp_cast_of_cast(t);
     NODE* operand = t->left;
     erase_node(t);
     return operand;
 }
 
-NODE* simp_QUEST(NODE* t) {
-    if (t->left->op != ICON || t->right->op != COLON) return t;
+NODE* simp_QUEST(NODE* t, struct LOOP* loop) {
+    if (t->left->op != ICON || t->right->op != COLON) return simp_arms(t, loop);
     NODE* colon = t->right;
     bool is_true = !t->left->u.lval.is_zero();
     NODE *kept = is_true ? colon->left : colon->right, *dropped = is_true ? colon->right : colon->left;
@@ -87,11 +90,23 @@ NODE* simp_node(NODE* t, struct LOOP* loop) {
     case IF:
     case CBRANCH: return simp_branch_condition(t, loop);
     case EXCLAIM: return simp_EXCLAIM(t);
-    case QUEST: return simp_QUEST(t);
+    case QUEST: return simp_QUEST(t, loop);
     case ANDAND:
     case OROR: return simp_logical(t, loop);
     case SCONV: return simp_SCONV(t);
-    default: return t;
+    case PLUS: return simp_PLUS(t);
+    case MINUS: return simp_MINUS(t);
+    case MULT: return simp_MULT(t);
+    case DIV: return simp_DIV(t);
+    case MOD: return simp_MOD(t);
+    case SLL:
+    case SRL: return simp_shift(t);
+    case ANDB:
+    case ORB:
+    case XORB: return simp_bitop(t);
+    case UMINUS:
+    case NOTB: return simp_unary(t);
+    default: return op_is_int_compare(t->op) ? simp_relop(t) : t;
     }
 }
 
@@ -117,6 +132,8 @@ NODE* simp_tree(NODE* t, struct LOOP* loop) {
     if (t->right) t->right = simp_tree(t->right, loop);
     return simp_node(t, loop);
 }
+
+void init_simplifier() { type_ops_seams.find_known_zeros = find_known_zeros; }
 
 void simp_all_trees() {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'simp_all_trees' ----------\n");

@@ -9,6 +9,9 @@
 
 struct LOOP;
 
+// Once, after `init_types`: tells the type rules on trees what the simplifier knows of values.
+void init_simplifier();
+
 void simp_all_trees();                          // every statement of the current function
 NODE* simp_tree(NODE* tree, struct LOOP* loop); // operands first
 NODE* simp_node(NODE* tree, struct LOOP* loop); // operands are simplified already

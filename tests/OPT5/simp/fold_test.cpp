@@ -232,12 +232,12 @@ TEST_F(Simp, BitFieldsTruncateWhatTheyStore) {
 // As deep as the reader accepts, leaning to either side, in time that grows with the size.
 TEST_F(Simp, DeepTrees) {
     run_on_big_stack(std::size_t(1) << 30, [] {
-        SYMTAB *x = symbol("x", tp->int_t), *y = symbol("y", tp->int_t);
+        SYMTAB *x = symbol("x", tp->int_t), *y = symbol("y", tp->int_t), *z = symbol("z", tp->int_t);
         for (bool leans_left : {true, false}) {
             NODE *t = name(x), *other = name(y);
             for (int i = 0; i < 200000; ++i) {
-                t = leans_left ? bin(PLUS, t, icon(1), tp->int_t) : bin(PLUS, icon(1), t, tp->int_t);
-                other = leans_left ? bin(PLUS, other, icon(1), tp->int_t) : bin(PLUS, icon(1), other, tp->int_t);
+                t = leans_left ? bin(PLUS, t, name(z), tp->int_t) : bin(PLUS, name(z), t, tp->int_t);
+                other = leans_left ? bin(PLUS, other, name(z), tp->int_t) : bin(PLUS, name(z), other, tp->int_t);
             }
             EXPECT_FALSE(trees_are_congruent(t, other, false));
             EXPECT_TRUE(trees_are_congruent(t, copy_tree(t), false));

@@ -1,0 +1,33 @@
+// What is known of the bits of an integer value, from the shape of the tree that computes it.
+#pragma once
+
+#include "OPT5/ir/node.h"
+
+#include <cstdint>
+
+struct LOOP;
+
+// Bits of a value at its type's width that are zero, or one, whatever the variables hold. A bit is in at most one mask.
+struct KNOWN_BITS {
+    uint64_t zeros = 0;
+    uint64_t ones = 0;
+};
+
+// Of an integer or enumeration tree of at most 64 bits; nothing is known of another. Looks a fixed number of levels
+// deep, so that asking at every node of a tree stays linear.
+KNOWN_BITS known_bits(const NODE* tree);
+
+// The same as masks within the type's width; `type` is the tree's own.
+INT65 find_known_zeros(const NODE* tree, TYPE* type);
+INT65 find_known_ones(const NODE* tree, TYPE* type);
+INT65 find_known_zeros_in_ANDB(const NODE* tree, TYPE* type);
+// Bits that are equal in every value from `low` to `high`, as masks of 65-bit values.
+INT65 find_known_zeros_in_range(INT65 low, INT65 high);
+INT65 find_known_ones_in_range(INT65 low, INT65 high);
+
+// Whether the value is known not to be negative, to be negative, to be zero, or not to be zero. A `loop` that is not
+// null is the one that the tree stands in; its facts may be used.
+bool tree_is_non_negative(const NODE* tree, struct LOOP* loop);
+bool tree_is_negative(const NODE* tree, struct LOOP* loop);
+bool tree_is_zero(const NODE* tree, struct LOOP* loop);
+bool tree_is_non_zero(const NODE* tree, struct LOOP* loop);

@@ -92,6 +92,10 @@ void check_pointer(const NODE* t, const char* what) {
     if (!t->left->type->is_pointer()) refuse_input(std::string(what) + " through what is no pointer");
 }
 
+void check_integer(const NODE* t, const char* what) {
+    if (!t->type->is_int() && !t->type->is_enum()) refuse_input(std::string(what) + " of type " + t->type->printstr());
+}
+
 // What is true or false is a scalar, or a mask of truth values.
 void check_truth_value(const NODE* t) {
     if (!t->type->is_scalar() && !t->type->is_vector()) refuse_input("the truth of a " + t->type->printstr());
@@ -145,14 +149,24 @@ void check_operands(const NODE* t) {
         check_truth_value(t->left);
         return;
     case LOOP:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::label);
+        return;
     case ENDLOOP:
         check(t->left, ROLE::value);
         check(t->right, ROLE::label);
+        check_integer(t->left, "a loop counter");
+        return;
+    case PMCONV:
+        check(t->left, ROLE::value);
+        check(t->right, ROLE::value);
+        for (const NODE* n : {t, static_cast<const NODE*>(t->left), static_cast<const NODE*>(t->right)})
+            check_integer(n, "a pointer's scale");
         return;
     case SWITCH:
         check(t->left, ROLE::value);
         check(t->right, ROLE::cases);
-        if (!t->left->type->is_int() && !t->left->type->is_enum()) refuse_input("a switch on what is no integer");
+        check_integer(t->left, "the value of a switch");
         return;
     default:
         if (t->left) check(t->left, ROLE::value);

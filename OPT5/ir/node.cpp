@@ -137,6 +137,12 @@ void NODE::mk_field(int kind, fkMDATA* member, TYPE* csu) {
     type = type->normalized_type();
 }
 
+// A file may give a constant any type; one that no constant has is refused where the tree is checked.
+static void set_constant(NODE* t, INT65 value) {
+    const bool wraps = t->type && (t->type->is_int() || t->type->is_enum() || t->type->is_pointer());
+    t->u.lval = wraps ? truncate_to_type(value, t->type) : value;
+}
+
 // The file carries 32 bits, read by the sign of the node's type.
 void NODE::mk_icon(int64_t value) {
     bool is_32_bits = value >= INT32_MIN && value <= UINT32_MAX;
@@ -146,7 +152,7 @@ void NODE::mk_icon(int64_t value) {
         u.lval = INT65(static_cast<int32_t>(value));
     else
         u.lval = INT65(static_cast<uint32_t>(value));
-    if (type && (type->is_int() || type->is_enum() || type->is_pointer())) u.lval = truncate_to_type(u.lval, type);
+    set_constant(this, u.lval);
 }
 
 void NODE::mk_lcon(const char* digits) {
@@ -155,7 +161,7 @@ void NODE::mk_lcon(const char* digits) {
     INT65 value = static_cast<int64_t>(strtoull(digits, nullptr, 10));
     value.sign = 0;
     op = ICON;
-    u.lval = truncate_to_type(negative ? -value : value, type);
+    set_constant(this, negative ? -value : value);
 }
 
 void NODE::mk_fcon(const char* number) {

@@ -231,6 +231,18 @@ TEST_F(ShapeTest, AListIsNoValue) {
 TEST_F(ShapeTest, IndirectionNeedsAPointer) {
     refuses(node(op::UMULT, i, name(x)), "an indirection through what is no pointer");
 }
+TEST_F(ShapeTest, WideConstantsHaveAnIntegerType) {
+    IC_NODE* wide = node(op::LCON, pkg.float_t);
+    wide->text = "4294967296";
+    refuses(node(op::ASG, i, name(x), wide), "a constant ICON of type float");
+}
+TEST_F(ShapeTest, CountersAndScalesAreIntegers) {
+    refuses(node(op::PMCONV, pkg.float_t, name(x), icon(16)), "a pointer's scale of type float");
+}
+TEST_F(ShapeTest, TruthIsAScalar) {
+    IC_SYMBOL* f = global("_f", int_fn, 5);
+    refuses(node(op::CBRANCH, i, name(f), ref(1)), "the truth of a int()");
+}
 TEST_F(ShapeTest, ConstantsHaveTheirKindOfType) {
     refuses(node(op::ASG, i, name(x), icon(1, pkg.float_t)), "a constant ICON of type float");
 }

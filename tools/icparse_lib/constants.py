@@ -172,8 +172,8 @@ def initializer_item(node, type_, where):
         return trees.convert(number, type_, where)
     pointer = T.unqualified(type_) if T.is_pointer(type_) else T.Pointer(T.VOID)
     if address.base.op == Op.SCON:
-        text = Node(Op.SCON, T.Pointer(T.CHAR), value=address.base.value)
-        tree = text if T.strip(pointer.target).key == T.CHAR.key else trees.retype(text, pointer)
+        # Under a cast even to its own type: a bare string stands for the elements of an array.
+        tree = Node(Op.PCONV, pointer, Node(Op.SCON, T.Pointer(T.CHAR), value=address.base.value))
     else:
         tree = Node(Op.UAND, pointer if not T.is_function(address.base.type) else T.Pointer(address.base.type),
                     address.base)

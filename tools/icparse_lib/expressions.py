@@ -281,7 +281,8 @@ class Expressions:
         if name in intrinsics.TABLE and (found is None or getattr(found, "klass", None) == Symbol.EXTERNAL):
             return self._intrinsic(intrinsics.TABLE[name], arguments, where)
         if found is None:
-            raise CompileError(where, f"function '{name}' is not declared")
+            self.translator.warn(where, f"function '{name}' is not declared")
+            self.translator.declare_function(name, T.Function(T.INT, [], prototype=False), where)
         return None
 
     def _va_start(self, arguments, where):

@@ -7,6 +7,8 @@ _PLAIN = {"*": Op.MULT, "/": Op.DIV, "%": Op.MOD, "&": Op.ANDB, "|": Op.ORB, "^"
           "<<": Op.SLL, ">>": Op.SRL}
 _ASSIGNING = {"*": Op.MULTASG, "/": Op.DIVASG, "%": Op.MODASG, "&": Op.ANDBASG, "|": Op.ORBASG, "^": Op.XORBASG,
               "+": Op.PLUSASG, "-": Op.MINUSASG, "<<": Op.SLLASG, ">>": Op.SRLASG}
+_ACTING = {Op.CALL, Op.UCALL, Op.ICALL, Op.UICALL, Op.MCALL, Op.UMCALL, Op.ASG, Op.STASG, Op.PLUSPLUS, Op.MINMIN,
+           *_ASSIGNING.values()}
 _COMPARE = {"==": (Op.EQ, Op.EQ), "!=": (Op.NEQ, Op.NEQ), "<": (Op.LT, Op.ULT), "<=": (Op.LE, Op.ULE),
             ">": (Op.GT, Op.UGT), ">=": (Op.GE, Op.UGE)}
 _INTEGER_ONLY = {"%", "&", "|", "^", "<<", ">>"}
@@ -33,7 +35,7 @@ def binary(operator, left, right, where):
         raise _bad_operands(operator, left, right, where)
     left, right = promoted(left, where), promoted(right, where)
     if operator in ("<<", ">>"):
-        return Node(_PLAIN[operator], left.type, left, trees.convert(right, T.INT, where))
+        return Node(_PLAIN[operator], T.as_integer(left.type), left, trees.convert(right, T.INT, where))
     common = T.usual(left.type, right.type)
     return Node(_PLAIN[operator], common, trees.convert(left, common, where), trees.convert(right, common, where))
 
@@ -72,10 +74,7 @@ def _common_pointers(operator, left, right, where):
         return trees.zero(right.type), right
     if not T.is_pointer(left.type) or not T.is_pointer(right.type):
         raise _bad_operands(operator, left, right, where)
-    a, b = T.pointed_to(left.type), T.pointed_to(right.type)
-    if T.is_void(a) or T.is_void(b) or T.compatible(T.unqualified(a), T.unqualified(b)):
-        return left, trees.retype(right, T.unqualified(left.type))
-    raise _bad_operands(operator, left, right, where)
+    return left, trees.retype(right, T.unqualified(left.type))
 
 
 def logical(operator, left, right, where):
@@ -96,7 +95,8 @@ def unary(operator, operand, where):
     operand = promoted(operand, where)
     if operator == "+":
         return operand
-    node = Node(Op.UMINUS if operator == "-" else Op.NOTB, operand.type, operand)
+    type_ = T.as_integer(operand.type) if T.is_integer(operand.type) else T.strip(operand.type)
+    node = Node(Op.UMINUS if operator == "-" else Op.NOTB, type_, operand)
     literal = trees.is_integer_constant(operand) or operand.op == Op.FCON
     return constants.fold(node) or node if literal else node
 
@@ -155,8 +155,7 @@ def is_pure(node):
     """Whether evaluating a tree twice is the same as once: no side effects, no calls, nothing volatile."""
     if node is None:
         return True
-    if node.op in (Op.CALL, Op.UCALL, Op.ICALL, Op.UICALL, Op.MCALL, Op.UMCALL, Op.ASG, Op.STASG, Op.PLUSPLUS,
-                   Op.MINMIN) or node.op in _ASSIGNING.values():
+    if node.op in _ACTING:
         return False
     if node.op in (Op.NAME, Op.UMULT, Op.STDOT) and T.qualifiers(node.type) & T.VOLATILE:
         return False

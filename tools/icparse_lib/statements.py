@@ -249,7 +249,7 @@ class Statements:
         if not T.is_integer(value.type):
             raise CompileError(where, f"switch on '{value.type}'")
         value = operators.promoted(value, where)
-        done, switch = self.new_label(), Switch(value.type)
+        done, switch = self.new_label(), Switch(T.as_integer(value.type))
         self.break_labels.append(done)
         self.switches.append(switch)
         at = len(self.items)

@@ -195,6 +195,10 @@ class Translator:
             self.scopes.stack[0].names.setdefault(name, symbol)
         return symbol
 
+    def declare_function(self, name, type_, where):
+        """Declares a function that is called without a declaration."""
+        self._declare(name, type_, [], [], where)
+
     def _new_symbol(self, name, type_, storage, specifiers, where):
         # An inline function without "extern" has its definition for this file alone.
         local = "static" in storage or ("inline" in (specifiers or []) and "extern" not in storage)

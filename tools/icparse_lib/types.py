@@ -346,9 +346,9 @@ def promote(type_, width=None):
 
 def usual(left, right):
     """The common type of two promoted arithmetic types."""
+    left, right = (as_integer(t) if is_integer(t) else strip(t) for t in (left, right))
     if is_floating(left) or is_floating(right):
-        floats = [t for t in (left, right) if is_floating(t)]
-        return max(floats, key=lambda t: t.kind)
+        return max((t for t in (left, right) if is_floating(t)), key=lambda t: t.kind)
     if left.kind == right.kind:
         return left
     if left.signed == right.signed:

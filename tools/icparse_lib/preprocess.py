@@ -15,6 +15,10 @@ LINE_MARKER = re.compile(r'#\s*(?:line\s+)?(\d+)\s+"((?:\\.|[^"\\])*)"')
 PARSE_ERROR = re.compile(r"(.*?):(\d+):(?:(\d+):)?\s*(.*)", re.S)
 CPP_ERROR = re.compile(r"^(.*?):(\d+):(\d+): (?:fatal )?error: (.*)$", re.M)
 
+# Names that must be types to the parser library; the declarations themselves mean nothing.
+BUILT_IN_NAMES = {"__wchar_t"}
+BUILT_IN_TYPES = "".join(f"typedef int {name};\n" for name in sorted(BUILT_IN_NAMES))
+
 PREDEFINED = ("__ZELKOVA__=1", "__signed__=signed", "__inline=inline", "__inline__=inline", "__restrict=restrict",
               "__restrict__=restrict", "__const=const", "__volatile=volatile", "__extension__=")
 
@@ -67,7 +71,7 @@ def parse(path, include_dirs, defines, eabi):
     if "asm" in text:
         text = ASM.sub(lambda m: "asm" + " " * (len(m[0]) - 3), lift_file_scope_asm(text))
     try:
-        return c_parser.CParser().parse(text, path)
+        return c_parser.CParser().parse(BUILT_IN_TYPES + text, path)
     except c_parser.ParseError as error:
         found = PARSE_ERROR.match(str(error))
         if not found:

@@ -10,6 +10,7 @@ from .errors import CompileError, position_of
 from .expressions import Expressions
 from .initializers import Initializers
 from .model import FunctionBody, Op, Statement, Symbol, Text
+from .preprocess import BUILT_IN_NAMES
 from .scopes import Scopes
 from .statements import Statements
 
@@ -121,6 +122,8 @@ class Translator:
             self.symbol_pragmas.add(name, arguments, where)
 
     def _typedef(self, node):
+        if node.name in BUILT_IN_NAMES:
+            return
         where = position_of(node)
         type_ = T.Typedef(node.name, self.types.type_of(node), where)
         known = self.scopes.find_here(node.name)

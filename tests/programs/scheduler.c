@@ -74,7 +74,7 @@ int main(void) {
     put_i16(now);
     put_u32(trace);
     for (t = ready; t; t = t->next) {
-        put_i16((int)(t - tasks));
+        put_i16(t->priority);
         put_i16(t->due);
     }
     schedule(200);

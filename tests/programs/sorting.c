@@ -59,7 +59,7 @@ static void shell(int *a, int n) {
 
 static void quick(int *a, int n) {
     while (n > 1) {
-        int pivot = a[n / 2], i = -1, j = n;
+        int pivot = a[(n - 1) / 2], i = -1, j = n;
         for (;;) {
             do i++;
             while (less(a[i], pivot));

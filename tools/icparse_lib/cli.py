@@ -18,33 +18,37 @@ def parse_arguments(arguments):
     parser.add_argument("-I", dest="include", action="append", default=[], metavar="DIR")
     parser.add_argument("-D", dest="define", action="append", default=[], metavar="NAME[=V]")
     parser.add_argument("--abi", choices=("legacy", "eabi"), default="legacy")
-    parser.add_argument("--opt", action="append", default=[], metavar="WORD", help="a word of option set 0")
-    parser.add_argument("--set", action="append", nargs=2, default=[], metavar=("N", "WORD"), dest="sets",
-                        help="a word of option set N")
+    parser.add_argument("--opt", metavar="WORD", help="a word of option set 0; may be repeated, and may begin with '-'")
+    parser.add_argument("--set", nargs=2, metavar=("N", "WORD"), help="a word of option set N")
     parser.add_argument("-w", dest="quiet", action="store_true", help="no warnings")
-    options, rest = parser.parse_known_args(join_option_words(arguments))
-    if rest:
-        parser.error(f"unknown option {rest[0]}")
+    rest, sets = take_option_words(arguments, parser)
+    options = parser.parse_args(rest)
+    options.sets = sets
     return options
 
 
-def join_option_words(arguments):
-    """`--opt WORD` where the word itself begins with '-'."""
-    out = list(arguments)
-    for index, argument in enumerate(out):
-        if argument == "--opt" and index + 1 < len(out):
-            out[index:index + 2] = [f"--opt={out[index + 1]}"]
-    return out
+def take_option_words(arguments, parser):
+    """Takes `--opt WORD` and `--set N WORD` out of the arguments, since WORD may look like an option itself."""
+    rest, sets, words = [], {}, iter(arguments)
+    for word in words:
+        try:
+            if word == "--opt":
+                sets.setdefault(0, []).append(next(words))
+            elif word == "--set":
+                number = int(next(words))
+                sets.setdefault(number, []).append(next(words))
+            else:
+                rest.append(word)
+        except (StopIteration, ValueError):
+            parser.error(f"{word} needs {'a word' if word == '--opt' else 'a number and a word'}")
+    return rest, sets
 
 
 def translate(options):
     """The bytes of the I-file."""
     T.set_abi(options.abi == "eabi")
     unit, linked = Unit(os.path.basename(options.files[0])), {}
-    if options.opt:
-        unit.option_sets[0] = list(options.opt)
-    for number, word in options.sets:
-        unit.option_sets.setdefault(int(number), []).append(word)
+    unit.option_sets = options.sets
     for path in options.files:
         tree = preprocess.parse(path, options.include, options.define, options.abi == "eabi")
         Translator(unit, linked, None if options.quiet else sys.stderr).file(tree)

@@ -31,6 +31,7 @@ class TypeBuilder:
 
     def __init__(self, translator):
         self.translator, self.scopes = translator, translator.scopes
+        self.defined = {}  # syntax node of a tag's definition: its type; the declarators of one declaration share it
 
     def type_of(self, node):
         """The type of a declarator tree."""
@@ -62,11 +63,17 @@ class TypeBuilder:
             if "_Complex" in node.names:
                 raise CompileError(where, "complex types are not supported")
             return basic(node.names, where)
+        if node in self.defined:
+            return self.defined[node]
         if isinstance(node, (A.Struct, A.Union)):
-            return self._record(node, where)
-        if isinstance(node, A.Enum):
-            return self._enum(node, where)
-        raise CompileError(where, "unsupported type")
+            type_, defines = self._record(node, where), node.decls is not None
+        elif isinstance(node, A.Enum):
+            type_, defines = self._enum(node, where), node.values is not None
+        else:
+            raise CompileError(where, "unsupported type")
+        if defines:
+            self.defined[node] = type_
+        return type_
 
     def _array(self, node, where):
         element = self.type_of(node.type)

@@ -266,7 +266,7 @@ class Translator:
         for index, parameter in enumerate(names):
             where = position_of(parameter)
             if parameter.name is None and not old_style:
-                raise CompileError(where, "a parameter has no name")
+                raise CompileError(position_of(node.decl), "a parameter has no name")
             if old_style:
                 decl = declared.get(parameter.name)
                 own = self.types.adjusted(self.types.type_of(decl)) if decl else T.INT

@@ -5,25 +5,25 @@ from . import constants, types as T
 from .errors import CompileError, position_of
 from .scopes import EnumConstant
 
+# Specifier words in alphabetical order, without what adds nothing: "signed" (but for char) and "int" beside others.
 _SPECIFIERS = {
-    ("void",): T.VOID, ("_Bool",): T.BOOL, ("char",): T.CHAR, ("char", "signed"): T.SCHAR,
-    ("char", "unsigned"): T.UCHAR, ("short",): T.SHORT, ("short", "unsigned"): T.USHORT, ("int",): T.INT,
-    ("unsigned",): T.UINT, ("long",): T.LONG, ("long", "unsigned"): T.ULONG, ("long", "long"): T.LLONG,
-    ("long", "long", "unsigned"): T.ULLONG, ("float",): T.FLOAT, ("double",): T.DOUBLE,
-    ("double", "long"): T.LDOUBLE, ("__wchar_t",): T.WCHAR,
+    "void": T.VOID, "_Bool": T.BOOL, "char": T.CHAR, "char signed": T.SCHAR, "char unsigned": T.UCHAR, "short": T.SHORT,
+    "short unsigned": T.USHORT, "": T.INT, "unsigned": T.UINT, "long": T.LONG, "long unsigned": T.ULONG,
+    "long long": T.LLONG, "long long unsigned": T.ULLONG, "float": T.FLOAT, "double": T.DOUBLE,
+    "double long": T.LDOUBLE, "__wchar_t": T.WCHAR,
 }
+_TAKES_INT = {"", "short", "short unsigned", "unsigned", "long", "long unsigned", "long long", "long long unsigned"}
 
 
 def basic(names, where):
     """The type of a list of specifier words in any order."""
     words = sorted(names)
-    if words in (["signed"], ["int", "signed"]):
-        return T.INT
-    key = tuple(w for w in words if w != "int" and w != "signed" or words == ["int"] or (w == "signed" and "char" in words))
-    found = _SPECIFIERS.get(key)
-    if found is None or ("signed" in words and "unsigned" in words):
+    ints, signs = words.count("int"), words.count("signed")
+    kept = " ".join(w for w in words if w != "int" and (w != "signed" or "char" in words))
+    sound = ints <= 1 and signs <= 1 and words.count("unsigned") + signs <= 1
+    if kept not in _SPECIFIERS or not sound or ((ints or signs and "char" not in words) and kept not in _TAKES_INT):
         raise CompileError(where, f"'{' '.join(names)}' is not a type")
-    return found
+    return _SPECIFIERS[kept]
 
 
 class TypeBuilder:

@@ -119,17 +119,15 @@ class Initializers:
         places = [[outer, 0]]  # innermost last, each with the index that comes next
         for item in items:
             where = position_of(item) or where
-            expression = item
             if isinstance(item, A.NamedInitializer):
                 places = self._designate(outer, item.name, where)
-                expression = item.expr
-            while len(places) > 1 and not places[-1][0].has(places[-1][1]) and not isinstance(
-                    item, A.NamedInitializer):
+                self._place(places, item.expr, where)
+                continue
+            while len(places) > 1 and not places[-1][0].has(places[-1][1]):
                 places.pop()
-            aggregate, index = places[-1]
-            if not aggregate.has(index) and not isinstance(item, A.NamedInitializer):
+            if not places[-1][0].has(places[-1][1]):
                 raise CompileError(where, "too many initializers")
-            self._place(places, expression, where)
+            self._place(places, item, where)
 
     def _place(self, places, expression, where):
         value = None
@@ -152,36 +150,42 @@ class Initializers:
             places.append([inner, 0])
 
     def _designate(self, outer, designators, where):
-        places, aggregate = [], outer
+        """The places on the way to what `.a[1].b` designates, innermost last; each but the last is passed already."""
+        places = []
         for designator in designators:
-            if aggregate is None:
-                aggregate = places[-1][0].inner(places[-1][1])
-            if isinstance(designator, A.ID) and not aggregate.is_array:
-                path = T.strip(aggregate.type).find(designator.name)
-                if path is None:
-                    raise CompileError(where, f"'{aggregate.type}' has no member '{designator.name}'")
-                for step, member in enumerate(path):
-                    if step:
-                        aggregate = places[-1][0].inner(places[-1][1])
-                    places.append([aggregate, member.number - 1])
-            elif aggregate.is_array and not (isinstance(designator, A.ID) and self._is_member_name(designator)):
-                value = self.translator.expressions.value(designator)
-                index = constants.require_integer(value, where, "the designator")
-                if index < 0 or (aggregate.count is not None and index >= aggregate.count):
-                    raise CompileError(where, f"index {index} is outside the array")
-                places.append([aggregate, index])
+            aggregate = outer
+            if places:
+                type_ = places[-1][0].part_type(places[-1][1])
+                if T.is_scalar(type_):
+                    raise CompileError(where, f"the designator does not fit '{type_}'")
+                aggregate = self._enter(places)
+            if aggregate.is_array:
+                places.append([aggregate, self._designated_element(aggregate, designator, where)])
             else:
-                raise CompileError(where, f"the designator does not fit '{aggregate.type}'")
-            aggregate = None
-            inner = places[-1][0].part_type(places[-1][1])
-            if designator is not designators[-1] and T.is_scalar(inner):
-                raise CompileError(where, f"the designator does not fit '{inner}'")
-        for place in places[:-1]:  # what follows the designated part stays in the innermost aggregate
-            place[1] = place[0].count if place[0].is_union else place[1] + 1
+                self._designated_member(aggregate, designator, places, where)
         return places
 
-    def _is_member_name(self, designator):
-        return self.translator.scopes.find(designator.name) is None
+    @staticmethod
+    def _enter(places):
+        """The aggregate at the innermost place, which is thereby passed."""
+        aggregate, index = places[-1]
+        places[-1][1] = aggregate.count if aggregate.is_union else index + 1
+        return aggregate.inner(index)
+
+    def _designated_element(self, aggregate, designator, where):
+        value = self.translator.expressions.value(designator)
+        index = constants.require_integer(value, where, "the designator")
+        if index < 0 or (aggregate.count is not None and index >= aggregate.count):
+            raise CompileError(where, f"index {index} is outside the array")
+        return index
+
+    def _designated_member(self, aggregate, designator, places, where):
+        name = designator.name if isinstance(designator, A.ID) else None
+        path = T.strip(aggregate.type).find(name) if name else None
+        if path is None:
+            raise CompileError(where, f"'{aggregate.type}' has no member '{name or '[]'}'")
+        for step, member in enumerate(path):
+            places.append([self._enter(places) if step else aggregate, member.number - 1])
 
     # ---- Static objects
     def static_items(self, type_, part, where):

@@ -9,8 +9,10 @@ KINDS = {name: int(kind) for kind, name in (_ROW.match(row).groups()
                                             for row in read_rows("IFILE/pragma_names.def", "PRAGMA_NAME"))}
 
 # Loop pragmas and the number of their arguments; a missing one is an empty text.
-LOOP = {"UNROLL": 1, "MUST_ITERATE": 3, "PROB_ITERATE": 2, "LOOP_NO_ALIAS": 0, "PARALLEL_LOOP": 0, "COALESCE_LOOP": 0,
-        "NO_COALESCE_LOOP": 0, "NO_NLC": 0}
+LOOP = {"UNROLL": 1, "UNROLL_AMOUNT": 1, "MUST_ITERATE": 3, "PROB_ITERATE": 2, "LOOP_FLAGS": 1, "LOOP_NO_ALIAS": 0,
+        "NO_ALIAS_CLONE": 0, "PARALLEL_LOOP": 0, "MMA_LOOP": 0, "COALESCE_LOOP": 0, "NO_COALESCE_LOOP": 0, "NO_NLC": 0}
+# Pragmas that inside a function speak of the calls in the next statement.
+STATEMENT = {"FORCEINLINE", "FORCEINLINE_RECURSIVE", "NOINLINE"}
 # Pragmas whose first argument names a symbol. INTERRUPT is a mark of the symbol and has no record of its own.
 SYMBOL = {name for name in KINDS if name.startswith(("FUNC_", "DATA_", "SYM_", "FORCEINLINE", "NOINLINE"))} | {
     "QZ_WEAK", "CODE_SECTION", "INTERRUPT", "WEAK", "RETAIN"}

@@ -359,6 +359,8 @@ class Statements:
         name, arguments = pragmas.split(node.string or "")
         if name in pragmas.LOOP:
             self.loop_pragmas.append(Pragma(*pragmas.loop_pragma(name, arguments, where)))
+        elif name in pragmas.STATEMENT and not arguments:
+            self.items.append(Pragma(pragmas.KINDS[name], []))
         else:
             self.translator.pragma(node)
 

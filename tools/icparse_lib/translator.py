@@ -34,7 +34,6 @@ class Translator:
         self.expressions = Expressions(self)
         self.initializers = Initializers(self)
         self.symbol_pragmas = pragmas.SymbolPragmas()
-        self.next_function_pragmas = []
         self.tentative = []  # symbols that get zeros if no initializer comes
 
     # ---- Services
@@ -237,8 +236,8 @@ class Translator:
         self._parameters(node, function)
         statements = Statements(self, body)
         statements.function_body(node.body)
-        body.end = where
-        statements.end(where)
+        body.end = position_of((node.body.block_items or [node.body])[-1]) or where
+        statements.end(body.end)
         self._prolog(body)
         self.scopes.pop()
         self.function = None

@@ -6,6 +6,8 @@ behind them. Two types are the same I-file type exactly if their `key`s are equa
 to themselves.
 """
 
+import itertools
+
 UNIT = 16
 
 CONST, VOLATILE, RESTRICT = 1, 2, 64
@@ -133,16 +135,22 @@ class Member:
         self.offset = self.number = 0
 
 
+_serial = itertools.count(1)
+
+
+def _identity(tag):
+    """(key, name) of a new record or enumeration, which is the same type as no other. Without a tag it gets a name."""
+    number = next(_serial)
+    return ("tagged", number), tag or f"$$fake{number}"
+
+
 class Record(Type):
     """A structure or union. It is incomplete until `lay_out` gives it its members."""
-    serial = 0
 
     def __init__(self, is_union, tag, position):
-        Record.serial += 1
         self.is_union, self.tag, self.position = is_union, tag, position
         self.members, self.complete = [], False
-        self.key = ("record", Record.serial)
-        self.name = tag or f"$$fake{Record.serial}"
+        self.key, self.name = _identity(tag)
 
     def lay_out(self, members):
         """Places the members. A bit-field never crosses a boundary of its declared type; width 0 goes to the next one."""
@@ -188,14 +196,10 @@ class Record(Type):
 
 
 class Enum(Type):
-    serial = 0
-
     def __init__(self, tag, position):
-        Enum.serial += 1
         self.tag, self.position = tag, position
         self.enumerators, self.underlying, self.complete = [], None, False
-        self.key = ("enum", Enum.serial)
-        self.name = tag or f"$$fake{Enum.serial + 1000000}"
+        self.key, self.name = _identity(tag)
 
     size = property(lambda self: self.underlying.size if self.underlying else UNIT)
     align = property(lambda self: self.underlying.align if self.underlying else UNIT)

@@ -47,7 +47,10 @@ def judge_variant(tools, unit, want, name, words):
 
 def judge_program(tools, source, levels, folder):
     """All failures of one program, each a line of text; none when it passes."""
-    want = Outcome(0, source.with_suffix(".expected").read_text())
+    expected = source.with_suffix(".expected")
+    if not expected.exists():
+        return [f"{expected.name} is missing"]
+    want = Outcome(0, expected.read_text())
     unit = Path(folder) / f"{source.stem}.if"
     try:
         tools.parse(source, unit)

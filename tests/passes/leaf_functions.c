@@ -1,0 +1,27 @@
+// A function without calls says that it is a leaf; one with calls, direct or by pointer, does not.
+// RUN: --opt_level=2 --disable_inlining
+#include <zrun.h>
+
+int g;
+
+// FUNCTION: leaf
+// COUNT 1: /function info.*leaf/
+int leaf(int x) { return x + g; }
+
+// FUNCTION: caller
+// COUNT 0: leaf)
+// COUNT 1: _leaf(
+int caller(int x) {
+    g = x;
+    return leaf(x) + g;
+}
+
+// FUNCTION: indirect
+// COUNT 0: leaf)
+int indirect(int (*f)(int), int x) { return f(x); }
+
+int main(void) {
+    put_i16(caller(3));
+    put_i16(indirect(caller, 4));
+    return 0;
+}

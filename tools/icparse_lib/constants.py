@@ -174,9 +174,11 @@ def initializer_item(node, type_, where):
     if address.base.op == Op.SCON:
         # Under a cast even to its own type: a bare string stands for the elements of an array.
         tree = Node(Op.PCONV, pointer, Node(Op.SCON, T.Pointer(T.CHAR), value=address.base.value))
+    elif T.is_function(address.base.type):
+        tree = trees.decay(address.base)
     else:
-        tree = Node(Op.UAND, pointer if not T.is_function(address.base.type) else T.Pointer(address.base.type),
-                    address.base)
+        tree = trees.retype(trees.decay(address.base) if T.is_array(address.base.type) else
+                            trees.address(address.base), pointer)
     if address.offset:
         size = T.INT if T.INT.minimum <= address.offset <= T.INT.maximum else T.LONG
         tree = Node(Op.PLUS, pointer, tree, trees.integer(size, address.offset))

@@ -20,7 +20,8 @@ BUILT_IN_NAMES = {"__wchar_t"}
 BUILT_IN_TYPES = "".join(f"typedef int {name};\n" for name in sorted(BUILT_IN_NAMES))
 
 PREDEFINED = ("__ZELKOVA__=1", "__signed__=signed", "__inline=inline", "__inline__=inline", "__restrict=restrict",
-              "__restrict__=restrict", "__const=const", "__volatile=volatile", "__extension__=")
+              "__restrict__=restrict", "__const=const", "__volatile=volatile", "__extension__=",
+              '__interrupt=_Pragma("INTERRUPT_NEXT")')
 
 
 def preprocess(path, include_dirs, defines, eabi):

@@ -23,6 +23,7 @@ class Statements:
         self.body = body
         self.items = body.block.items
         self.last_label = 0
+        self.referenced = set()  # numbers of labels that a statement names
         self.labels = {}        # name: [number, defined, position of first use]
         self.break_labels, self.continue_labels, self.switches = [], [], []
         self.loop_pragmas = []  # for the next loop
@@ -44,11 +45,17 @@ class Statements:
         return self.last_label
 
     def place_label(self, number):
+        """A label that something names, or will: the head of a loop, a case, a label of the source."""
         self.items.append(Label(number))
         self.reachable = True
 
-    @staticmethod
-    def _reference(number):
+    def join(self, number):
+        """A label that is only named by what stands before it, and left out if nothing does."""
+        if number in self.referenced:
+            self.place_label(number)
+
+    def _reference(self, number):
+        self.referenced.add(number)
         return Node(Op.LABELREF, T.VOID, value=number)
 
     def branch(self, number, where):
@@ -90,16 +97,16 @@ class Statements:
         condition = tree.left if tree.op == Op.ANDAND else trees.falsity(tree.left)
         self.branch_if_false(condition, done, where)
         self.effects(tree.right, where)
-        self.place_label(done)
+        self.join(done)
 
     def _conditional_effects(self, tree, where):
         otherwise, done = self.new_label(), self.new_label()
         self.branch_if_false(tree.left, otherwise, where)
         self.effects(tree.right.left, where)
         self.branch(done, where)
-        self.place_label(otherwise)
+        self.join(otherwise)
         self.effects(tree.right.right, where)
-        self.place_label(done)
+        self.join(done)
 
     # ---- Statements
     def statement(self, node):
@@ -167,7 +174,7 @@ class Statements:
         self.emit(trees.assign(element, trees.zero(element.type)), where)
         self.emit(Node(Op.PLUSPLUS, counter.type, counter, trees.integer(counter.type, 1)), where)
         self.branch(top, where)
-        self.place_label(done)
+        self.join(done)
 
     def _condition(self, node):
         return trees.truth(self.expressions.scalar(node, "the condition"))
@@ -178,14 +185,14 @@ class Statements:
         self.branch_if_false(self._condition(node.cond), otherwise, where)
         self._in_scope(where, lambda: self.statement(node.iftrue))
         if node.iffalse is None:
-            self.place_label(otherwise)
+            self.join(otherwise)
             return
         done = self.new_label()
         if self.reachable:
             self.branch(done, where)
-        self.place_label(otherwise)
+        self.join(otherwise)
         self._in_scope(where, lambda: self.statement(node.iffalse))
-        self.place_label(done)
+        self.join(done)
 
     def _begin_loop(self):
         """Puts the waiting loop pragmas right before the loop's first label."""
@@ -199,7 +206,7 @@ class Statements:
     def _end_loop(self, done):
         self.continue_labels.pop()
         self.break_labels.pop()
-        self.place_label(done)
+        self.join(done)
 
     def _while(self, node):
         where = position_of(node)
@@ -216,7 +223,7 @@ class Statements:
         top, again, done = self._begin_loop()
         self.place_label(top)
         self._in_scope(where, lambda: self.statement(node.stmt))
-        self.place_label(again)
+        self.join(again)
         condition = self._condition(node.cond)
         at = position_of(node.cond) or where
         if constants.integer_value(condition) != 0:
@@ -237,7 +244,7 @@ class Statements:
         if node.cond is not None:
             self.branch_if_false(self._condition(node.cond), done, where)
         self._in_scope(where, lambda: self.statement(node.stmt))
-        self.place_label(again)
+        self.join(again)
         if node.next is not None:
             self.effects(self.expressions.value(node.next), position_of(node.next) or where)
         self.branch(top, where)
@@ -268,7 +275,7 @@ class Statements:
             self.effects(value, where)
             self.emit(Node(Op.BRANCH, T.VOID, self._reference(default)), where)
         self.items += body
-        self.place_label(done)
+        self.join(done)
 
     def _case(self, node):
         where = position_of(node)

@@ -34,6 +34,7 @@ class Translator:
         self.expressions = Expressions(self)
         self.initializers = Initializers(self)
         self.symbol_pragmas = pragmas.SymbolPragmas()
+        self.next_is_interrupt = False  # the next function declared is an interrupt routine
         self.tentative = []  # symbols that get zeros if no initializer comes
 
     # ---- Services
@@ -117,6 +118,8 @@ class Translator:
         if name == "ASM_TEXT":
             _, codes = literals.string_codes(node.string, where)
             self.unit.items.append(Text(bytes(codes[:-1]).decode("utf-8", "surrogateescape"), where))
+        elif name == "INTERRUPT_NEXT":
+            self.next_is_interrupt = True
         elif name in pragmas.SYMBOL:
             self.symbol_pragmas.add(name, arguments, where)
 
@@ -190,12 +193,20 @@ class Translator:
             symbol = known
         else:
             symbol = self._new_symbol(name, type_, storage, specifiers, where)
-        if "inline" in (specifiers or []):
-            (symbol.link or symbol).qualifier_bits |= Symbol.INLINE_BIT
+        self._specify(symbol.link or symbol, specifiers or [])
         self.scopes.enter(name, symbol)
         if not self.scopes.at_file_scope:
             self.scopes.stack[0].names.setdefault(name, symbol)
         return symbol
+
+    def _specify(self, symbol, specifiers):
+        if "inline" in specifiers:
+            symbol.qualifier_bits |= Symbol.INLINE_BIT
+        if "_Noreturn" in specifiers and (pragmas.NEVER_RETURNS, []) not in symbol.pragmas:
+            symbol.pragmas.append((pragmas.NEVER_RETURNS, []))
+        if self.next_is_interrupt and T.is_function(symbol.type):
+            symbol.qualifier_bits |= Symbol.INTERRUPT_BIT
+            self.next_is_interrupt = False
 
     def declare_function(self, name, type_, where):
         """Declares a function that is called without a declaration."""
@@ -343,6 +354,6 @@ class Translator:
 
 def finish(unit):
     """Drops the declarations that nothing uses."""
-    unit.symbols = [s for s in unit.symbols if s.used or s.klass != Symbol.EXTERNAL or s.pragmas]
+    unit.symbols = [s for s in unit.symbols if s.used or s.klass != Symbol.EXTERNAL]
 
 

@@ -8,7 +8,7 @@ import tempfile
 ROOT = os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "..", "..")
 sys.path.insert(0, os.path.join(ROOT, "tools"))
 
-from icparse_lib import preprocess, types as T  # noqa: E402
+from icparse_lib import intrinsics, preprocess, types as T  # noqa: E402
 from icparse_lib.errors import CompileError  # noqa: E402
 from icparse_lib.model import Block, FunctionBody, Label, Op, Pragma, Statement, Text, Unit  # noqa: E402
 from icparse_lib.translator import Translator, finish  # noqa: E402

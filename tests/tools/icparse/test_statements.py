@@ -1,9 +1,10 @@
 """Statements, declarations, pragmas, initializers' lists, and errors with their positions."""
 import os
+import re
 import tempfile
 import unittest
 
-from support import body_of, compile_files, error_of, initializer, symbol_of, translate, Warnings
+from support import ROOT, body_of, compile_files, error_of, initializer, intrinsics, symbol_of, translate, Warnings
 
 
 class Bodies(unittest.TestCase):
@@ -22,16 +23,18 @@ class Bodies(unittest.TestCase):
         self.check("int g; void f(void) { for (int i = 0; i < 3; ++i) if (i == g) continue; }", "{i", "ASG(i, 0:int)",
                    "L1:", "CBRANCH(LT(i, 3:int), L3)", "CBRANCH(EQ(i, _g), L4)", "BRANCH(L2)", "L4:", "L2:",
                    "PLUSASG(i, 1:int)", "BRANCH(L1)", "L3:", "}", "URETURN(_f)")
-        self.check("int g; void f(void) { do g++; while (g < 3 && g != 2); }", "L1:", "PLUSPLUS(_g, 1:int)", "L2:",
+        self.check("int g; void f(void) { do g++; while (g < 3 && g != 2); }", "L1:", "PLUSPLUS(_g, 1:int)",
                    "CBRANCH(ANDAND(LT(_g, 3:int), NEQ(_g, 2:int)), L3)", "BRANCH(L1)", "L3:", "URETURN(_f)")
-        self.check("void f(void) { for (;;) ; }", "L1:", "L2:", "BRANCH(L1)", "L3:", "URETURN(_f)")
+        self.check("void f(void) { for (;;) ; }", "L1:", "BRANCH(L1)")
+        self.check("int f(int x) { if (x) return 1; else return 2; }", "ASG(x, x)", "CBRANCH(NEQ(x, 0:int), L1)",
+                   "RETURN(_f, 1:int)", "L1:", "RETURN(_f, 2:int)")
 
     def test_switches(self):
         self.check("void f(long x) { switch (x) { case 1: case 70000: return; default: ; } }", "ASG(x, x)",
                    "SWITCH(x, COMMA(COMMA(CASE(1:long, L2), CASE(70000:long, L3)), DEFAULT(L4)))", "L2:", "L3:",
-                   "URETURN(_f)", "L4:", "L1:", "URETURN(_f)")
+                   "URETURN(_f)", "L4:", "URETURN(_f)")
         self.check("int g(void); void f(void) { switch (g()) { default: ; } }", "UCALL(UAND(_g))", "BRANCH(L2)", "L2:",
-                   "L1:", "URETURN(_f)")
+                   "URETURN(_f)")
 
     def test_only_effects_of_unused_values_stay(self):
         self.check("volatile int v; int g, *p; int h(void); void f(void) { g; v; (void)(g + h()); *p++; g, g = 1; }", "_v",
@@ -80,11 +83,39 @@ class Symbols(unittest.TestCase):
             #pragma INTERRUPT(f)
             int d; void f(void) { }
             #pragma FUNC_ALWAYS_INLINE(f)
-            #pragma DATA_ALIGN(nowhere, 8)""")
+            #pragma DATA_ALIGN(nowhere, 8)
+            __interrupt void timer(void); void timer(void) { } _Noreturn void stop(void) { for (;;) ; }""")
+        self.assertEqual(symbol_of(unit, "_timer").qualifier_bits, 0x20)
+        self.assertEqual(symbol_of(unit, "_stop").pragmas, [(3, [])])
         self.assertEqual(symbol_of(unit, "_f").pragmas, [(4, []), (88, [])])
         self.assertEqual(symbol_of(unit, "_f").qualifier_bits, 0x20)
         self.assertEqual(symbol_of(unit, "_d").pragmas, [(2, ["fast"]), (0, ["8"])])
         self.assertEqual(symbol_of(unit, "_d").align, 128)
+
+
+class Headers(unittest.TestCase):
+    FOLDER = os.path.join(ROOT, "tools", "include")
+
+    def test_each_stands_alone_and_may_come_twice(self):
+        for header in sorted(os.listdir(self.FOLDER)):
+            with self.subTest(header):
+                self.assertEqual(error_of(f"#include <{header}>\n#include <{header}>\nint x;"), "no error")
+
+    def test_the_built_ins_are_those_of_the_optimizer(self):
+        with open(os.path.join(self.FOLDER, "intrinsics.h")) as text:
+            declared = {name: re.sub(r"\s*\*", " *", f"{result}({parameters})").replace(" (", "(")
+                        for result, name, parameters in re.findall(r"^(\w[\w *]*?)(_\w+)\((.*)\);", text.read(), re.M)}
+        wanted = {name: f"{i.result}({', '.join(map(str, i.parameters)) or 'void'})"
+                  for name, i in intrinsics.TABLE.items() if None not in i.parameters}
+        self.assertEqual({name: text.strip() for name, text in declared.items()},
+                         {name: text for name, text in wanted.items()})
+
+    def test_variable_arguments_lie_behind_the_last_parameter(self):
+        source = """#include <stdarg.h>
+            long f(char *s, int n, ...) { va_list l; va_start(l, n); return va_arg(l, long); }"""
+        self.assertEqual(body_of(translate(source))[0], "ASG(l, PCONV.va_list(PLUS(UAND(n), 1:int)))")
+        self.assertEqual(error_of("void f(int a, int b, ...) { char *p; __builtin_va_start(p, a); }"),
+                         "t.c:1:38: error: va_start needs the last parameter of the function")
 
 
 class StaticInitializers(unittest.TestCase):
@@ -100,9 +131,9 @@ class StaticInitializers(unittest.TestCase):
             ("union { int a; int b; } x = { 1 };", ["1:int"]),
             ("char x[] = \"a\\0b\";", ["97:char", "0:char", "98:char", "0:char"]),
             ("const char *x[] = { \"ab\" };", ["PCONV.const char *('ab\\x00')"]),
-            ("int g[3][4], *x = &g[1][2];", ["PLUS(UAND(_g), 6:int)"]),
-            ("int g[3][4]; unsigned long x = (unsigned long)&g[1];", ["SCONV.unsigned long(PLUS(UAND(_g), 4:int))"]),
-            ("struct S { long a; int b; } g; int *x = &(&g + 1)->b;", ["PLUS(UAND(_g), 6:int)"]),
+            ("int g[3][4], *x = &g[1][2];", ["PLUS(PCONV.int *(UAND(_g)), 6:int)"]),
+            ("int g[3][4]; unsigned long x = (unsigned long)&g[1];", ["SCONV.unsigned long(PLUS(PCONV.void *(UAND(_g)), 4:int))"]),
+            ("struct S { long a; int b; } g; int *x = &(&g + 1)->b;", ["PLUS(PCONV.int *(UAND(_g)), 6:int)"]),
             ("int x = (int)(3.9 * 2) + sizeof(long) * (1 ? 5 : 1 / 0);", ["17:int"]),
             ("long x = -7 / 2 * 100 + -7 % 2;", ["-301:long"]),
             ("int *x = (int *)0x7000;", ["PCONV.int *(28672:long)"]),

@@ -1,0 +1,177 @@
+// Functions: the frame, the statements, labels and switches.
+#include "tools/exec/compile.h"
+
+#include <algorithm>
+#include <cctype>
+
+namespace {
+enum : int { class_global = 2, class_static = 3, class_extern = 5 };
+
+// Text of inline assembly that does nothing.
+bool is_comment(const char* text) {
+    while (*text == ' ' || *text == '\t') text++;
+    return *text == 0 || *text == ';' || *text == '*' || *text == '\n';
+}
+int64_t count_down(const XNODE* x, MACHINE& m) { return run(x->a, m) == 0; }
+} // namespace
+
+// Parameters and locals, each at a multiple of its alignment. Statics and declarations of objects elsewhere have their
+// places among the unit's objects.
+void COMPILER::lay_out_frame() {
+    size_t parameter = 0;
+    for (IC_SYMBOL* s : f->source->locals) {
+        if (s->sclass == class_static || s->sclass == class_extern || p.entries.count(s)) continue;
+        const SHAPE shape = shape_of(s->type);
+        const uint64_t units = std::max<uint64_t>({shape.units, (s->size + 15) / 16, 1});
+        const uint64_t mask = units > 1 ? std::max<uint64_t>(shape.align_mask, 1) : shape.align_mask;
+        f->frame = (f->frame + mask) & ~mask;
+        locals[s] = {B_FRAME, static_cast<int64_t>(f->frame), units};
+        f->frame += units;
+        if (s->level == 1 && parameter < f->params.size()) f->params[parameter++].offset = locals[s].at;
+    }
+}
+
+STMT& COMPILER::add(STMT_KIND kind, uint32_t line) {
+    f->code.emplace_back();
+    f->code.back().kind = kind;
+    f->code.back().line = line;
+    return f->code.back();
+}
+
+void COMPILER::switch_table() {
+    p.tables.emplace_back();
+    SWITCH_TABLE& table = p.tables.back();
+    table.other = static_cast<uint32_t>(f->code.size()); // behind the statement
+    f->code.back().table = &table;
+}
+
+void COMPILER::statement(const IC_NODE* n, uint32_t line) {
+    n = strip_marks(n);
+    cost = 1;
+    if (n->op == op::LOOP) {
+        if (const IC_NODE* l = strip_marks(n->right); l && l->op == op::LABEL) define(l->number);
+        return;
+    }
+    STMT& s = add(S_EXPR, line);
+    const uint32_t at = static_cast<uint32_t>(f->code.size() - 1);
+    switch (n->op) {
+    case op::BRANCH:
+        s.kind = S_BRANCH;
+        jumps.push_back({at, strip_marks(n->left)});
+        break;
+    case op::CBRANCH: {
+        const XNODE* x = truth(n->left);
+        f->code[at].kind = S_CBRANCH;
+        f->code[at].tree = x;
+        jumps.push_back({at, strip_marks(n->right)});
+        break;
+    }
+    case op::ENDLOOP: { // counts down; the loop ends when the counter passes 0
+        IC_NODE one(nullptr), minus(nullptr);
+        one.op = op::ICON;
+        one.type = n->left->type;
+        one.value = 1;
+        minus.op = op::MINUSASG;
+        minus.type = n->left->type;
+        minus.left = n->left;
+        minus.right = &one;
+        const SHAPE shape = shape_of(n->left->type);
+        const XNODE* left = value(&minus);
+        const XNODE* up = p.node(binary_eval(op::PLUS, shape.rep), left, constant(1));
+        f->code[at].kind = S_CBRANCH;
+        f->code[at].tree = p.node(count_down, up);
+        jumps.push_back({at, strip_marks(n->right)});
+        break;
+    }
+    case op::SWITCH: {
+        const XNODE* x = value(n->left);
+        f->code[at].kind = S_SWITCH;
+        f->code[at].tree = x;
+        switch_table();
+        jumps.push_back({at, n});
+        break;
+    }
+    case op::RETURN: {
+        const XNODE* x = f->result.rep == R_VOID ? value(n->right) : value_as(n->right, f->result);
+        f->code[at].kind = S_RETURN;
+        f->code[at].tree = x;
+        break;
+    }
+    case op::URETURN: s.kind = S_URETURN; break;
+    default: {
+        const XNODE* x = value(n);
+        f->code[at].tree = x;
+    }
+    }
+    f->code[at].cost = cost;
+}
+
+// Labels are known now: branches and switches get their targets.
+void COMPILER::resolve() {
+    auto find = [&](const IC_NODE* label, uint32_t& target) {
+        auto it = label && label->op == op::LABEL ? labels.find(label->number) : labels.end();
+        if (it != labels.end()) {
+            target = it->second;
+            return;
+        }
+        target = static_cast<uint32_t>(f->code.size());
+        STMT& s = add(S_FAIL, 0);
+        s.status = EXEC_BAD_FILE;
+        s.text = "branch to a label that is nowhere";
+    };
+    for (auto [at, n] : jumps) {
+        uint32_t target = 0;
+        if (n && n->op == op::SWITCH) {
+            auto& table = const_cast<SWITCH_TABLE&>(*f->code[at].table);
+            const SHAPE shape = shape_of(strip_marks(n->left)->type);
+            std::vector<const IC_NODE*> rest{n->right};
+            while (!rest.empty()) {
+                const IC_NODE* c = strip_marks(rest.back());
+                rest.pop_back();
+                if (!c) continue;
+                if (c->op == op::COMMA) {
+                    rest.push_back(c->right);
+                    rest.push_back(c->left);
+                } else if (c->op == op::CASE) {
+                    find(strip_marks(c->right), target);
+                    table.cases.push_back({number(strip_marks(c->left), shape)->k, target});
+                } else if (c->op == op::DEFAULT) {
+                    find(strip_marks(c->left), table.other);
+                }
+            }
+            std::sort(table.cases.begin(), table.cases.end());
+        } else {
+            find(n, target);
+            f->code[at].target = target;
+        }
+    }
+}
+
+void COMPILER::function() {
+    const IC_FUNC& source = *f->source;
+    lay_out_frame();
+    uint32_t line = 0;
+    for (size_t i = source.first; i <= source.last && i < p.unit.items.size(); i++) {
+        const IC_ITEM& item = p.unit.items[i];
+        if (item.psn) line = static_cast<uint32_t>(item.psn->line);
+        switch (item.kind) {
+        case IFR_EXPR:
+            if (item.tree) statement(item.tree, line);
+            break;
+        case IFR_LABEL: define(item.number); break;
+        case IFR_ASM:
+            if (!is_comment(item.text)) {
+                STMT& s = add(S_FAIL, line);
+                s.status = EXEC_UNSUPPORTED;
+                s.text = "inline assembly cannot be executed";
+            }
+            break;
+        default: break;
+        }
+    }
+    add(S_URETURN, line);
+    resolve();
+    f->frame = (f->frame + 3) & ~uint64_t{3};
+    f->depth = deepest;
+    f->compiled = true;
+}

@@ -1,0 +1,204 @@
+// The machine that compiled trees run on: memory, frames, and the compiled form itself.
+//
+// A tree becomes a tree of XNODEs, each a function pointer with its operands and constants resolved: types, widths,
+// addresses and member offsets are settled once, when a function is compiled. A value is an int64_t in normal form:
+// sign- or zero-extended as its type says; a floating value is the bits of a double, which for a single holds only
+// values that a single can have; a structure is its address.
+#pragma once
+
+#include "tools/exec/exec.h"
+
+#include <cmath>
+#include <cstdint>
+#include <cstring>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+// How a value of a type is held and computed.
+enum REP : uint8_t { R_VOID, R_S16, R_U16, R_S32, R_U32, R_S64, R_U64, R_F32, R_F64, R_AGG, R_FUNC };
+
+struct SHAPE {
+    REP rep = R_VOID;
+    uint8_t bits = 0; // of an integer; narrower than the representation for odd widths only
+    bool is_bool = false;
+    bool is_pointer = false;
+    uint32_t units = 0;      // 16-bit units in memory
+    uint32_t align_mask = 0; // an address of an object of this type has these bits clear
+
+    bool is_float() const { return rep == R_F32 || rep == R_F64; }
+    bool is_int() const { return rep >= R_S16 && rep <= R_U64; }
+    bool is_signed() const { return rep == R_S16 || rep == R_S32 || rep == R_S64; }
+    bool same_value(const SHAPE& o) const { return rep == o.rep && bits == o.bits && is_bool == o.is_bool; }
+};
+SHAPE shape_of(TYPE* type);
+SHAPE int_shape(int bits, bool is_signed);
+SHAPE float_shape(int bits);
+SHAPE promoted(const SHAPE& s);
+SHAPE combined(const SHAPE& a, const SHAPE& b); // the usual arithmetic conversions
+
+struct MACHINE;
+struct XNODE;
+using EVAL = int64_t (*)(const XNODE*, MACHINE&);
+
+struct XNODE {
+    EVAL run = nullptr;
+    const XNODE* a = nullptr;
+    const XNODE* b = nullptr;
+    const XNODE* c = nullptr;
+    int64_t k = 0;         // constant, address, frame offset
+    uint32_t m = 0, n = 0; // masks, widths, counts
+    const void* extra = nullptr;
+};
+inline int64_t run(const XNODE* x, MACHINE& machine) { return x->run(x, machine); }
+
+inline double as_float(int64_t v) {
+    double d;
+    std::memcpy(&d, &v, 8);
+    return d;
+}
+inline int64_t from_float(double d) {
+    int64_t v;
+    std::memcpy(&v, &d, 8);
+    return v;
+}
+
+enum STMT_KIND : uint8_t { S_EXPR, S_BRANCH, S_CBRANCH, S_COUNTED, S_SWITCH, S_RETURN, S_URETURN, S_MARK, S_FAIL };
+
+struct SWITCH_TABLE {
+    std::vector<std::pair<int64_t, uint32_t>> cases; // by value
+    uint32_t other;                                  // target of default, or the next statement
+};
+
+struct STMT {
+    STMT_KIND kind = S_EXPR;
+    const XNODE* tree = nullptr;
+    uint32_t target = 0; // index of a statement; of S_MARK, a loop
+    uint32_t cost = 1;   // nodes
+    uint32_t line = 0;
+    uint64_t count = 0; // times executed
+    const SWITCH_TABLE* table = nullptr;
+    const char* text = nullptr; // of S_FAIL
+    int status = 0;
+};
+
+struct PARAMETER {
+    SHAPE shape;
+    int64_t offset;
+};
+
+struct LOOP_CHECK;
+
+struct FUNCTION {
+    IC_SYMBOL* sym = nullptr;
+    const IC_FUNC* source = nullptr;
+    std::string name;
+    bool compiled = false;
+    std::vector<STMT> code;
+    std::vector<PARAMETER> params;
+    SHAPE result;
+    uint64_t frame = 0; // units
+    size_t depth = 0;   // of its deepest tree
+    uint64_t calls = 0;
+    std::vector<LOOP_CHECK> loops;
+};
+
+struct LIBRARY_ENTRY;
+
+// What an address that stands for a function leads to.
+struct CALLEE {
+    FUNCTION* function = nullptr;           // defined in the unit
+    const LIBRARY_ENTRY* library = nullptr; // or by the executor
+    std::string name;
+};
+
+// One activation; the innermost is `MACHINE::top`.
+struct ACTIVATION {
+    FUNCTION* function;
+    const STMT* at;
+    ACTIVATION* up;
+};
+
+struct EXEC_ERROR {
+    int status;
+    std::string text;
+};
+struct EXEC_EXIT {
+    int status;
+};
+
+struct NODE_COUNTS {
+    uint64_t by_op[164] = {};
+    uint64_t loads = 0, stores = 0, branches = 0, calls = 0, multiplies = 0;
+};
+
+constexpr uint64_t null_page = 16;              // units at address 0 that nothing lives in
+constexpr uint64_t function_space = 0x70000000; // addresses of functions, beyond all memory
+
+struct MACHINE {
+    std::vector<uint16_t> memory;
+    uint64_t size = 0; // units
+    uint64_t fp = 0, sp = 0;
+    uint64_t steps = 0, step_limit = ~uint64_t{0};
+    uint64_t heap_begin = 0, heap_end = 0;
+    int64_t old_value = 0, right_value = 0; // operands of a compound assignment in work
+    uint64_t place = 0;                     // and its address
+    int64_t returned = 0;
+    ACTIVATION* top = nullptr;
+    uintptr_t host_stack_end = 0; // no frame of the host below this
+    std::vector<CALLEE> callees;  // by address - function_space
+    FILE* out = stdout;
+    NODE_COUNTS counts;
+    uint32_t random = 1;
+    std::vector<int64_t> at_exit;
+    std::map<uint64_t, uint64_t> blocks, holes; // the heap's: address to size
+
+    [[noreturn]] void fail(int status, const std::string& text) const { throw EXEC_ERROR{status, text}; }
+    [[noreturn]] void bad_address(uint64_t address, uint64_t units) const;
+    [[noreturn]] void unaligned(uint64_t address) const;
+
+    void check(uint64_t address, uint64_t units) const {
+        if (address < null_page || address >= size || units > size - address) bad_address(address, units);
+    }
+    uint64_t get(uint64_t address, unsigned units) const { // unchecked
+        uint64_t v = memory[address];
+        for (unsigned i = 1; i < units; i++) v |= static_cast<uint64_t>(memory[address + i]) << 16 * i;
+        return v;
+    }
+    void put(uint64_t address, unsigned units, uint64_t v) {
+        for (unsigned i = 0; i < units; i++) memory[address + i] = static_cast<uint16_t>(v >> 16 * i);
+    }
+    int64_t load(const SHAPE& shape, uint64_t address) const; // checked, by shape
+    void store(const SHAPE& shape, uint64_t address, int64_t value);
+    int64_t invoke(FUNCTION& f, const int64_t* args);
+    // A call through an address, with arguments of any shapes.
+    int64_t call(int64_t address, const int64_t* args, const SHAPE* shapes, TYPE* const* types, size_t n,
+                 const SHAPE& result);
+};
+
+int64_t wrap(int64_t v, unsigned bits, bool is_signed);
+int64_t convert_value(int64_t v, const SHAPE& from, const SHAPE& to);
+
+// ---- The library
+struct LIBRARY_ARGS {
+    MACHINE& m;
+    const int64_t* value;
+    const SHAPE* shape;
+    TYPE* const* type;
+    size_t n;
+
+    int64_t i(size_t k) const { return k < n ? convert_value(value[k], shape[k], int_shape(64, true)) : 0; }
+    double f(size_t k) const { return k < n ? as_float(convert_value(value[k], shape[k], float_shape(64))) : 0; }
+    uint64_t p(size_t k) const { return static_cast<uint32_t>(i(k)); }
+    // The object that argument k points to, by the pointer's type; `fallback` where that tells nothing.
+    SHAPE pointee(size_t k, const SHAPE& fallback) const;
+};
+struct LIBRARY_ENTRY {
+    const char* name;
+    char result; // i integer, f double, v none
+    int64_t (*run)(LIBRARY_ARGS&);
+};
+const LIBRARY_ENTRY* find_library(const std::string& name); // functions called by name
+const LIBRARY_ENTRY* find_builtin(const std::string& name); // built-in functions of the target
+int64_t run_library(const LIBRARY_ENTRY& entry, LIBRARY_ARGS& args, const SHAPE& result);

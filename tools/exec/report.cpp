@@ -1,0 +1,53 @@
+// Reports after a run.
+#include "tools/exec/report.h"
+
+#include <algorithm>
+
+namespace {
+unsigned long long ull(uint64_t v) { return v; }
+} // namespace
+
+// One line an object: a digest of its contents and its name, by name. Pointers have none: addresses differ between
+// layouts that are equally right.
+void print_globals(const PROGRAM& p, FILE* out) {
+    std::map<std::string, uint64_t> lines;
+    for (const IC_SYMBOL* s : p.unit.globals) {
+        auto it = p.places.find(s);
+        const SHAPE shape = shape_of(s->type);
+        if (it == p.places.end() || shape.is_pointer || std::strncmp(s->name, "$str", 4) == 0) continue;
+        uint64_t digest = 1469598103934665603u;
+        for (uint64_t i = 0; i < shape.units; i++)
+            digest = (digest ^ p.m.memory[static_cast<uint64_t>(it->second.at) + i]) * 1099511628211u;
+        lines[s->name] = digest;
+    }
+    for (const auto& [name, digest] : lines) std::fprintf(out, "%016llx %s\n", ull(digest), name.c_str());
+}
+
+void print_stats(const PROGRAM& p, FILE* out) {
+    const NODE_COUNTS& c = p.m.counts;
+    uint64_t nodes = 0;
+    for (uint64_t n : c.by_op) nodes += n;
+    uint64_t statements = 0;
+    for (const FUNCTION& f : p.functions)
+        for (const STMT& s : f.code) statements += s.count;
+    const uint64_t multiplies = c.by_op[op::MULT] + c.by_op[op::MULTASG] + c.by_op[op::SQR] + c.multiplies;
+    std::fprintf(out, "nodes %llu loads %llu stores %llu calls %llu branches %llu multiplies %llu statements %llu\n",
+                 ull(nodes), ull(c.loads), ull(c.stores), ull(c.calls), ull(c.branches), ull(multiplies),
+                 ull(statements));
+    for (int i = 0; i < 164; i++)
+        if (c.by_op[i]) std::fprintf(out, "%12llu %s\n", ull(c.by_op[i]), if_node_info[i].name);
+}
+
+void print_profile(const PROGRAM& p, FILE* out) {
+    for (const FUNCTION& f : p.functions) {
+        uint64_t nodes = 0;
+        std::map<uint32_t, uint64_t> lines;
+        for (const STMT& s : f.code) {
+            nodes += s.count * s.cost;
+            if (s.count) lines[s.line] += s.count;
+        }
+        if (!f.calls) continue;
+        std::fprintf(out, "%s: %llu calls, %llu nodes\n", f.name.c_str(), ull(f.calls), ull(nodes));
+        for (auto [line, count] : lines) std::fprintf(out, "%8u %12llu\n", line, ull(count));
+    }
+}

@@ -1,0 +1,154 @@
+// The run: activations and their statements, from main to the exit status.
+#include "tools/exec/compile.h"
+#include "tools/exec/report.h"
+
+#include "UTIL/big_stack.h"
+
+#include <algorithm>
+
+namespace {
+constexpr size_t host_stack = size_t{2} << 30; // touched only as needed
+constexpr size_t host_stack_reserve = 1 << 20;
+constexpr size_t host_bytes_a_level = 512; // of a tree, at the most
+
+uint32_t find_case(const SWITCH_TABLE& table, int64_t v) {
+    auto it = std::lower_bound(table.cases.begin(), table.cases.end(), v,
+                               [](const std::pair<int64_t, uint32_t>& c, int64_t x) { return c.first < x; });
+    return it != table.cases.end() && it->first == v ? it->second : table.other;
+}
+
+void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
+    STMT* const code = f.code.data();
+    for (uint32_t at = 0;;) {
+        STMT& s = code[at];
+        here.at = &s;
+        s.count++;
+        if ((m.steps += s.cost) > m.step_limit) m.fail(EXEC_STEPS, "too many steps");
+        switch (s.kind) {
+        case S_EXPR:
+            run(s.tree, m);
+            at++;
+            break;
+        case S_BRANCH:
+            m.counts.branches++;
+            at = s.target;
+            break;
+        case S_CBRANCH:
+            m.counts.branches++;
+            at = run(s.tree, m) ? at + 1 : s.target;
+            break;
+        case S_SWITCH:
+            m.counts.branches++;
+            at = find_case(*s.table, run(s.tree, m));
+            break;
+        case S_RETURN: m.returned = run(s.tree, m); return;
+        case S_URETURN: return;
+        default: m.fail(s.status, s.text);
+        }
+    }
+}
+} // namespace
+
+int64_t MACHINE::invoke(FUNCTION& f, const int64_t* args) {
+    const uintptr_t here_on_host = reinterpret_cast<uintptr_t>(__builtin_frame_address(0));
+    if (here_on_host < host_stack_end + f.depth * host_bytes_a_level + host_stack_reserve)
+        fail(EXEC_STACK, "stack overflow");
+    if (sp < heap_end + f.frame + 64) fail(EXEC_STACK, "stack overflow");
+    const uint64_t old_fp = fp, old_sp = sp;
+    sp -= f.frame;
+    const uint64_t frame = sp;
+    for (size_t i = 0; i < f.params.size(); i++)
+        store(f.params[i].shape, frame + static_cast<uint64_t>(f.params[i].offset), args[i]);
+    fp = frame;
+    f.calls++;
+    ACTIVATION here{&f, nullptr, top};
+    top = &here;
+    returned = 0;
+    run_statements(f, here, *this);
+    top = here.up;
+    fp = old_fp;
+    sp = old_sp;
+    return returned;
+}
+
+int64_t MACHINE::call(int64_t address, const int64_t* args, const SHAPE* shapes, TYPE* const* types, size_t n,
+                      const SHAPE& result) {
+    const uint64_t at = static_cast<uint64_t>(address) - function_space;
+    if (at >= callees.size()) fail(EXEC_BAD_ADDRESS, "call through an address that is no function's");
+    const CALLEE& callee = callees[at];
+    if (callee.library) {
+        LIBRARY_ARGS values{*this, args, shapes, types, n};
+        return run_library(*callee.library, values, result);
+    }
+    if (!callee.function) fail(EXEC_MISSING, "the function " + callee.name + " is nowhere defined");
+    FUNCTION& f = *callee.function;
+    std::vector<int64_t> converted(f.params.size() + 1);
+    for (size_t i = 0; i < f.params.size(); i++)
+        converted[i] = i < n                            ? convert_value(args[i], shapes[i], f.params[i].shape)
+                       : f.params[i].shape.rep == R_AGG ? static_cast<int64_t>(null_page)
+                                                        : 0;
+    return convert_value(invoke(f, converted.data()), f.result, result);
+}
+
+namespace {
+std::string where(const MACHINE& m) {
+    if (!m.top) return "";
+    std::string text = " (in " + m.top->function->name;
+    if (m.top->at && m.top->at->line) text += ", line " + std::to_string(m.top->at->line);
+    return text + ")";
+}
+
+int run_main(PROGRAM& p) {
+    MACHINE& m = p.m;
+    FUNCTION* main = p.find_main();
+    if (!main) m.fail(EXEC_MISSING, "the function main is nowhere defined");
+    int status;
+    try {
+        const std::vector<int64_t> none(main->params.size() + 1);
+        status = static_cast<int>(m.invoke(*main, none.data()) & 255);
+    } catch (const EXEC_EXIT& e) {
+        status = e.status;
+    }
+    while (!m.at_exit.empty()) {
+        const int64_t f = m.at_exit.back();
+        m.at_exit.pop_back();
+        try {
+            m.call(f, nullptr, nullptr, nullptr, 0, SHAPE{});
+        } catch (const EXEC_EXIT& e) {
+            status = e.status;
+        }
+    }
+    return status;
+}
+} // namespace
+
+EXEC_RESULT execute(const IC_UNIT& unit, const EXEC_OPTIONS& options, FILE* out, FILE* report) {
+    EXEC_RESULT result;
+    PROGRAM p(unit, options);
+    p.m.out = out;
+    if (options.max_steps) p.m.step_limit = options.max_steps;
+    for (const OPTION_SET& set : unit.option_sets)
+        for (const std::string& word : set.options)
+            if (word.find("eabi") != std::string::npos) p.name_prefix = false;
+    run_on_big_stack(host_stack, [&] {
+        p.m.host_stack_end = reinterpret_cast<uintptr_t>(__builtin_frame_address(0)) - host_stack + host_stack_reserve;
+        try {
+            p.lay_out();
+            p.initialize();
+            p.compile();
+            p.m.heap_begin = p.m.heap_end = (p.next + 63) & ~uint64_t{3};
+            p.m.sp = p.m.size & ~uint64_t{3};
+            p.m.counts = NODE_COUNTS();
+            result.status = run_main(p);
+        } catch (const EXEC_ERROR& e) {
+            result.failed = true;
+            result.status = e.status;
+            result.error = e.text + where(p.m);
+        }
+    });
+    std::fflush(out);
+    if (options.globals && !result.failed) print_globals(p, out);
+    if (options.stats) print_stats(p, report);
+    if (options.profile) print_profile(p, report);
+    return result;
+}

@@ -1,0 +1,63 @@
+"""tools/zrun: its statuses, what it shows and what it keeps. ZOPT, ICRUN, ICDUMP and ICPARSE name the programs."""
+import os
+import subprocess
+import tempfile
+import unittest
+from pathlib import Path
+
+ZRUN = Path(__file__).resolve().parents[3] / "tools" / "zrun"
+
+PROGRAM = """#include <zrun.h>
+static int f(int x) { goto next; next: return x + 1; }
+int main(void) { put_i16(f(41)); return 3; }
+"""
+
+# An optimizer whose output is another program's.
+LIAR = """#!/bin/sh
+for last; do :; done
+cp {other} $last
+"""
+
+
+class Zrun(unittest.TestCase):
+    def setUp(self):
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.folder = Path(folder.name)
+
+    def zrun(self, *words, source=PROGRAM):
+        path = self.folder / "p.c"
+        path.write_text(source)
+        return subprocess.run([ZRUN, path, *words], stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True)
+
+    def test_equal(self):
+        done = self.zrun("--opt_level=2", "--show", "--keep", self.folder / "kept")
+        self.assertEqual(done.returncode, 0, done.stderr)
+        self.assertIn("equal: 1 lines, status 3", done.stdout)
+        self.assertRegex(done.stdout, r"nodes +\d+ +\d+")
+        self.assertRegex(done.stdout, r"function _f: int\(int\) +\| function _f: int\(int\)")
+        kept = sorted(path.name for path in (self.folder / "kept").iterdir())
+        self.assertEqual(kept, ["p.if", "p.opt.if", "p.opt.out", "p.out"])
+        again = subprocess.run([ZRUN, self.folder / "kept" / "p.opt.if", "-o1"], stdout=subprocess.PIPE)
+        self.assertEqual(again.returncode, 0)
+
+    def test_different(self):
+        self.assertEqual(self.zrun("--keep", self.folder, source=PROGRAM.replace("41", "42")).returncode, 0)
+        other = self.folder / "other.if"
+        (self.folder / "p.opt.if").rename(other)
+        liar = self.folder / "liar"
+        liar.write_text(LIAR.format(other=other))
+        os.chmod(liar, 0o755)
+        done = self.zrun("--zopt", liar)
+        self.assertEqual(done.returncode, 1, done.stderr)
+        self.assertIn("different: line 1: '43' instead of '42'", done.stdout)
+
+    def test_trouble(self):
+        self.assertEqual(self.zrun(source="int main(void) { return x; }").returncode, 2)
+        self.assertEqual(self.zrun("--opt_level=99").returncode, 2)
+        self.assertEqual(self.zrun("--zopt", "/nowhere/zopt").returncode, 2)
+        self.assertEqual(subprocess.run([ZRUN, "absent.c"], stderr=subprocess.PIPE).returncode, 2)
+
+
+if __name__ == "__main__":
+    unittest.main()

@@ -235,19 +235,32 @@ EVAL binary_eval(int opcode, REP rep) {
 }
 
 EVAL compare_eval(int opcode, REP rep) {
-#define INT_CASE(OP)                                                                                                   \
-    case op::OP: return by_int_rep<COMPARE, op::OP>(rep);                                                              \
-        #define FLOAT_CASE(OP)                                                                                         \
-    case op::OP: return compare_float<op::OP>;
     switch (opcode) {
-        INT_CASE(EQ)
-        INT_CASE(NEQ) INT_CASE(LE) INT_CASE(LT) INT_CASE(GE) INT_CASE(GT) INT_CASE(ULE) INT_CASE(ULT) INT_CASE(UGE)
-            INT_CASE(UGT) FLOAT_CASE(FEQ) FLOAT_CASE(FNEQ) FLOAT_CASE(FLE) FLOAT_CASE(FLT) FLOAT_CASE(FGE)
-                FLOAT_CASE(FGT) FLOAT_CASE(FEQN) FLOAT_CASE(FNEQN) FLOAT_CASE(FLEN) FLOAT_CASE(FLTN) FLOAT_CASE(FGEN)
-                    FLOAT_CASE(FGTN) FLOAT_CASE(FORD) FLOAT_CASE(FUNO)
+    case op::EQ: return by_int_rep<COMPARE, op::EQ>(rep);
+    case op::NEQ: return by_int_rep<COMPARE, op::NEQ>(rep);
+    case op::LE: return by_int_rep<COMPARE, op::LE>(rep);
+    case op::LT: return by_int_rep<COMPARE, op::LT>(rep);
+    case op::GE: return by_int_rep<COMPARE, op::GE>(rep);
+    case op::GT: return by_int_rep<COMPARE, op::GT>(rep);
+    case op::ULE: return by_int_rep<COMPARE, op::ULE>(rep);
+    case op::ULT: return by_int_rep<COMPARE, op::ULT>(rep);
+    case op::UGE: return by_int_rep<COMPARE, op::UGE>(rep);
+    case op::UGT: return by_int_rep<COMPARE, op::UGT>(rep);
+    case op::FEQ: return compare_float<op::FEQ>;
+    case op::FNEQ: return compare_float<op::FNEQ>;
+    case op::FLE: return compare_float<op::FLE>;
+    case op::FLT: return compare_float<op::FLT>;
+    case op::FGE: return compare_float<op::FGE>;
+    case op::FGT: return compare_float<op::FGT>;
+    case op::FEQN: return compare_float<op::FEQN>;
+    case op::FNEQN: return compare_float<op::FNEQN>;
+    case op::FLEN: return compare_float<op::FLEN>;
+    case op::FLTN: return compare_float<op::FLTN>;
+    case op::FGEN: return compare_float<op::FGEN>;
+    case op::FGTN: return compare_float<op::FGTN>;
+    case op::FORD: return compare_float<op::FORD>;
+    case op::FUNO: return compare_float<op::FUNO>;
     }
-#undef INT_CASE
-#undef FLOAT_CASE
     return nullptr;
 }
 

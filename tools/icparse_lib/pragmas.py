@@ -19,7 +19,7 @@ SYMBOL = {name for name in KINDS if name.startswith(("FUNC_", "DATA_", "SYM_", "
 # Pragmas by which the source names kinds that the table knows under another name, or that have a meaning here alone.
 ALIASES = {"WEAK": "QZ_WEAK", "RETAIN": "SYM_IS_REFERENCED"}
 
-SCOPING_FUNC, NEVER_RETURNS = KINDS["SCOPING_FUNC"], KINDS["FUNC_NEVER_RETURNS"]
+SCOPING_FUNC, NEVER_RETURNS, SRC_LOOP = (KINDS[n] for n in ("SCOPING_FUNC", "FUNC_NEVER_RETURNS", "SRC_LOOP"))
 
 
 def split(text):

@@ -71,8 +71,11 @@ def parse(path, include_dirs, defines, eabi):
     text = preprocess(path, include_dirs, defines, eabi)
     if "asm" in text:
         text = ASM.sub(lambda m: "asm" + " " * (len(m[0]) - 3), lift_file_scope_asm(text))
+    parser = c_parser.CParser()
     try:
-        return c_parser.CParser().parse(BUILT_IN_TYPES + text, path)
+        return parser.parse(BUILT_IN_TYPES + text, path)
+    except AssertionError as error:  # some malformed declarations reach the parser library's own checks
+        raise CompileError(Position(parser.clex.filename, parser.clex.lexer.lineno, 0), "syntax error") from error
     except c_parser.ParseError as error:
         found = PARSE_ERROR.match(str(error))
         if not found:

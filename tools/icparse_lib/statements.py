@@ -194,14 +194,22 @@ class Statements:
         self._in_scope(where, lambda: self.statement(node.iffalse))
         self.join(done)
 
-    def _begin_loop(self):
-        """Puts the waiting loop pragmas right before the loop's first label."""
+    def _begin_loop(self, node, keyword):
+        """Puts the loop's place in the source and the waiting loop pragmas right before its first label."""
+        self.items.append(self._source_loop(node, keyword))
         self.items += self.loop_pragmas
         self.loop_pragmas = []
         labels = self.new_label(), self.new_label(), self.new_label()
         self.continue_labels.append(labels[1])
         self.break_labels.append(labels[2])
         return labels
+
+    def _source_loop(self, node, keyword):
+        """The pragma that reports name a loop by: first line, variable, last line, keyword."""
+        where = position_of(node)
+        start = str(where.line) if where.file == self.body.position.file else f"{where.file}:{where.line}"
+        variable = loop_variable(node.next) if isinstance(node, A.For) else ""
+        return Pragma(pragmas.SRC_LOOP, [start, variable, str(last_line(node)), keyword])
 
     def _end_loop(self, done):
         self.continue_labels.pop()
@@ -210,7 +218,7 @@ class Statements:
 
     def _while(self, node):
         where = position_of(node)
-        top, again, done = self._begin_loop()
+        top, again, done = self._begin_loop(node, "while")
         self.continue_labels[-1] = again = top
         self.place_label(top)
         self.branch_if_false(self._condition(node.cond), done, where)
@@ -220,7 +228,7 @@ class Statements:
 
     def _do(self, node):
         where = position_of(node)
-        top, again, done = self._begin_loop()
+        top, again, done = self._begin_loop(node, "do")
         self.place_label(top)
         self._in_scope(where, lambda: self.statement(node.stmt))
         self.join(again)
@@ -239,7 +247,7 @@ class Statements:
         waiting, self.loop_pragmas = self.loop_pragmas, []
         self.statement(node.init)
         self.loop_pragmas = waiting
-        top, again, done = self._begin_loop()
+        top, again, done = self._begin_loop(node, "for")
         self.place_label(top)
         if node.cond is not None:
             self.branch_if_false(self._condition(node.cond), done, where)
@@ -370,6 +378,22 @@ class Statements:
             self.items.append(Pragma(pragmas.KINDS[name], []))
         else:
             self.translator.pragma(node)
+
+
+def loop_variable(step):
+    """The name that a for loop's step changes, if it is a plain one."""
+    target = getattr(step, "expr", None) or getattr(step, "lvalue", None)
+    return target.name if isinstance(target, A.ID) else ""
+
+
+def last_line(node):
+    """The greatest line number in a syntax tree."""
+    last, pending = 0, [node]
+    while pending:
+        item = pending.pop()
+        last = max(last, getattr(item.coord, "line", 0) or 0)
+        pending += [child for _, child in item.children()]
+    return last
 
 
 def assembly_text(node, where):

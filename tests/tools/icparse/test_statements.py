@@ -9,7 +9,8 @@ from support import ROOT, body_of, compile_files, error_of, initializer, intrins
 
 class Bodies(unittest.TestCase):
     def check(self, source, *expected):
-        self.assertEqual(body_of(translate(source)), list(expected))
+        lines = [line for line in body_of(translate(source)) if not line.startswith("pragma 41")]
+        self.assertEqual(lines, list(expected))
 
     def test_parameters_are_copied_in_one_statement_if_used(self):
         self.check("struct S { int a; } g; void f(int a, struct S s, int unused, char *p) { g = s; g.a = a; *p = 1; }",
@@ -50,9 +51,14 @@ class Bodies(unittest.TestCase):
         source = """int g; void f(void) {
             #pragma MUST_ITERATE(8, , 4)
             #pragma UNROLL(2)
-            for (g = 0; g < 8; g++) ; }"""
-        self.assertEqual(body_of(translate(source))[:4],
-                         ["ASG(_g, 0:int)", "pragma 39 ['8', '', '4']", "pragma 37 ['2']", "L1:"])
+            for (g = 0; g < 8; g++)
+               ; while (g) { do g++;
+               while (g < 9); } }"""
+        lines = body_of(translate(source))
+        self.assertEqual(lines[:5], ["ASG(_g, 0:int)", "pragma 41 ['4', 'g', '5', 'for']", "pragma 39 ['8', '', '4']",
+                                     "pragma 37 ['2']", "L1:"])
+        self.assertEqual([line for line in lines if line.startswith("pragma 41")][1:],
+                         ["pragma 41 ['5', '', '6', 'while']", "pragma 41 ['5', '', '6', 'do']"])
 
     def test_assembly(self):
         unit = translate('asm(" .global x");\nint y;\nvoid f(void) { asm volatile (" nop" " ; \\n"); }')

@@ -57,6 +57,54 @@ PROGRAMS = {
             put_i64(a << 40); put_i64(m >> 60); put_i64(-9223372036854775807LL - 1); put_i16(m == a); put_i64(3000000000LL);
             put_i64(-134217729LL); put_i16((long long)1 << 33 > 0); return 0;
         }""", "0 -1099511627776 15 -9223372036854775808 1 3000000000 -134217729 1"),
+    "functions and their pointers": ("""
+        typedef int (*op)(int); enum color { RED, GREEN = 5, BLUE };
+        static int sq(int x) { return x * x; } static int neg(int x) { return -x; }
+        int apply(int (*g)(int), int v) { return g(v) + (*g)(v) + (**g)(v); } op pick(int k) { return k ? sq : neg; }
+        int (*choose(int k))(int) { return k > 1 ? pick(1) : k ? neg : 0; }
+        enum color next(enum color c) { switch (c) { case RED: return GREEN; case GREEN: return BLUE; default: return RED; } }
+        int fib(int n) { return n < 2 ? n : fib(n - 1) + fib(n - 2); }
+        void each(int *v, int n, void (*f)(int *)) { while (n--) f(v++); } void bump(int *p) { ++*p; }
+        static const struct { char c; op f; } table[] = { { 's', sq }, { 'n', neg } };
+        int main(void) {
+            int v[3] = { 1, 2, 3 }, i; put_i16(apply(sq, 3)); put_i16(pick(0)(7)); put_i16(choose(2)(5)); put_i16(choose(0) == 0);
+            put_i16(next(next(RED))); put_i16(next(BLUE)); put_i16(fib(12)); each(v, 3, bump); put_i16(v[0] * 100 + v[1] * 10 + v[2]);
+            for (i = 0; i < 2; i++) put_i16(table[i].f(4) + (table[i].c == 'n')); put_i16((i ? sq : neg)(6)); return 0;
+        }""", "27 -7 25 1 6 0 144 234 16 -3 36"),
+    "pointers and arrays": ("""
+        int m[2][3][4]; char *copy(char *d, const char *s) { char *r = d; while ((*d++ = *s++)) ; return r; }
+        int sum(int a[][4], int n) { int i, j, s = 0; for (i = 0; i < n; i++) for (j = 0; j < 4; j++) s += a[i][j]; return s; }
+        long long wide[3] = { 1, 2, 3 }; struct T { struct T *l, *r; int k; };
+        int depth(const struct T *t) { int l, r; if (!t) return 0; l = depth(t->l); r = depth(t->r); return 1 + (l > r ? l : r); }
+        int main(void) {
+            int (*p)[3][4] = m, (*row)[4] = m[1], *e = &m[1][2][3]; unsigned u = 2; char buf[8], *c; void *v = wide;
+            struct T a = { 0, 0, 1 }, b = { &a, 0, 2 }, t = { 0, &b, 3 };
+            m[1][2][3] = 5; row[0][1] = 6; put_i16(p[1][2][3]); put_i16(*(*(*(m + 1) + 2) + 3)); put_i16(e[-(int)u + 2]);
+            e -= u; e += 2; put_i16(*e); put_i16(sum(m[1], 3)); put_i32((char *)&m[1] - (char *)m); put_i32(&m[1] - m);
+            put_str(copy(buf, "hello")); c = buf; put_i16(*++c); put_i16(*c++ + (*c)++); put_i16(c[0]); put_i16(2[buf]);
+            put_i64(((long long *)v)[2]); put_i64(*((long long *)v + 1)); put_i16((long *)&wide[2] - (long *)wide); put_i16(depth(&t));
+            put_i16("xyz"[1]); put_i16(&wide[1] > wide && &wide[0] <= (long long *)v && e); return 0;
+        }""", "5 5 5 5 11 12 1 hello 101 209 109 109 3 2 4 3 121 1"),
+    "bit-fields and volatile objects": ("""
+        struct R { volatile unsigned ctl; union { unsigned all; struct { unsigned en : 1, mode : 3, : 4, irq : 8; } bit; } st; } regs;
+        #define R ((struct R *)&regs)
+        struct { int s : 3; unsigned u : 16; long w : 20; _Bool b : 1; } f; volatile int ticks; static int reads(void) { return ticks++; }
+        int main(void) {
+            R->st.bit.irq = 0x1A5; R->st.bit.mode = 5; R->st.bit.en = 1; put_u32(R->st.all); R->ctl |= 4; R->ctl <<= 2; put_i16(R->ctl);
+            f.s = 5; put_i16(f.s); f.u = -1; put_i16(f.u > 0); put_i16(f.s - 4 < f.u); f.w = 600000; put_i32(f.w); f.b = 6; put_i16(f.b);
+            put_i16(f.s++); put_i16(f.s); put_i16((f.s = 12) + 1); put_i16(-R->st.bit.mode < 0); reads(); ticks; put_i16(reads() * 10);
+            return 0;
+        }""", "42251 16 -3 1 1 -448576 1 -3 -2 -3 1 10"),
+    "integers of every width": ("""
+        unsigned ua = 50000; int ia = -1; long la = -70000; unsigned long ul = 4000000000; long long ll = 1; unsigned long long um = 7;
+        int main(void) {
+            put_i16(ia < ua); put_i16(la < ua); put_i16(la < ul); put_i32(ua + ia); put_u32(ua * 2); put_i32((long)ua * 2);
+            put_i32(-7 / 2); put_i16(-7 % 3); put_u32(ul / 3); put_u32(ul >> 4); put_i32(la >> 4); put_i16(ia >> 1); put_u32(ua >> 1);
+            put_i64(ll << 40); put_i64((ll << 40) / -3); put_i64(um - 8 > 0); put_i64((int)ul); put_i64((unsigned)la); put_i16('\\xFFFE');
+            put_i16(sizeof(char) + sizeof(long) + sizeof 1LL + sizeof 'a'); put_i64(0xFFFF + 1); put_i64(65535 + 1); put_i16(1 ? -1 : 0u);
+            put_f32(ul); put_f32((float)la / 16); put_i32(-2.9f); put_u32((unsigned)3.99); put_i64(1e15L); put_i16(!0.5f + !0); return 0;
+        }""", "0 1 0 49999 34464 100000 -3 -1 1333333333 250000000 -4375 -1 25000 1099511627776 -366503875925 1 10240 61072 -2 "
+              "8 0 65536 -1 4e+09 -4375 -2 3 1000000000000000 1"),
     "built-ins": ("""
         #include <intrinsics.h>
         int main(void) { put_i32(__mpy(-3, 4)); put_i16(__max(3, 9)); put_i16(__abs16_sat(-32767 - 1)); return 0; }""",

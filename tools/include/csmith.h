@@ -1,6 +1,6 @@
 /* What a program made by csmith asks of its platform, for 16-bit int.
 
-   The "8-bit" types have 16 bits, the smallest the target has. Arithmetic that C leaves undefined gives the left operand
+   The "8-bit" types have 16 bits, the least the target has. Arithmetic that C leaves undefined gives the left operand
    instead; the rest is done in the unsigned type, wide enough not to be promoted to a signed one. */
 #ifndef _CSMITH_H
 #define _CSMITH_H
@@ -13,34 +13,34 @@ typedef signed char int8_t;
 typedef unsigned char uint8_t;
 
 /* NAME of the type, its unsigned type, its least value, its width in bits. */
-#define CSMITH_SIGNED(NAME, UNSIGNED, MIN, BITS)                                                                        \
-    static NAME##_t safe_unary_minus_func_##NAME##_t_s(NAME##_t a) { return a == MIN ? a : (NAME##_t)-a; }              \
-    static NAME##_t safe_add_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b) { return (UNSIGNED)a + (UNSIGNED)b; }          \
-    static NAME##_t safe_sub_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b) { return (UNSIGNED)a - (UNSIGNED)b; }          \
-    static NAME##_t safe_mul_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b) { return (UNSIGNED)a * (UNSIGNED)b; }          \
-    static NAME##_t safe_div_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b)                                                \
-    { return b == 0 || (a == MIN && b == -1) ? a : a / b; }                                                             \
-    static NAME##_t safe_mod_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b)                                                \
-    { return b == 0 || (a == MIN && b == -1) ? a : a % b; }                                                             \
-    static NAME##_t safe_lshift_func_##NAME##_t_s_s(NAME##_t a, int b)                                                  \
-    { return a < 0 || b < 0 || b >= BITS ? a : (UNSIGNED)a << b; }                                                      \
-    static NAME##_t safe_lshift_func_##NAME##_t_s_u(NAME##_t a, unsigned int b)                                         \
-    { return a < 0 || b >= BITS ? a : (UNSIGNED)a << b; }                                                               \
-    static NAME##_t safe_rshift_func_##NAME##_t_s_s(NAME##_t a, int b)                                                  \
-    { return a < 0 || b < 0 || b >= BITS ? a : a >> b; }                                                                \
-    static NAME##_t safe_rshift_func_##NAME##_t_s_u(NAME##_t a, unsigned int b)                                         \
+#define CSMITH_SIGNED(NAME, UNSIGNED, MIN, BITS)                                                                    \
+    static NAME##_t safe_unary_minus_func_##NAME##_t_s(NAME##_t a) { return a == MIN ? a : (NAME##_t)-a; }          \
+    static NAME##_t safe_add_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b) { return (UNSIGNED)a + (UNSIGNED)b; }      \
+    static NAME##_t safe_sub_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b) { return (UNSIGNED)a - (UNSIGNED)b; }      \
+    static NAME##_t safe_mul_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b) { return (UNSIGNED)a * (UNSIGNED)b; }      \
+    static NAME##_t safe_div_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b)                                            \
+    { return b == 0 || (a == MIN && b == -1) ? a : a / b; }                                                         \
+    static NAME##_t safe_mod_func_##NAME##_t_s_s(NAME##_t a, NAME##_t b)                                            \
+    { return b == 0 || (a == MIN && b == -1) ? a : a % b; }                                                         \
+    static NAME##_t safe_lshift_func_##NAME##_t_s_s(NAME##_t a, int b)                                              \
+    { return a < 0 || b < 0 || b >= BITS ? a : (UNSIGNED)a << b; }                                                  \
+    static NAME##_t safe_lshift_func_##NAME##_t_s_u(NAME##_t a, unsigned int b)                                     \
+    { return a < 0 || b >= BITS ? a : (UNSIGNED)a << b; }                                                           \
+    static NAME##_t safe_rshift_func_##NAME##_t_s_s(NAME##_t a, int b)                                              \
+    { return a < 0 || b < 0 || b >= BITS ? a : a >> b; }                                                            \
+    static NAME##_t safe_rshift_func_##NAME##_t_s_u(NAME##_t a, unsigned int b)                                     \
     { return a < 0 || b >= BITS ? a : a >> b; }
 
-#define CSMITH_UNSIGNED(NAME, BITS)                                                                                     \
-    static NAME##_t safe_unary_minus_func_##NAME##_t_u(NAME##_t a) { return 0 - a; }                                    \
-    static NAME##_t safe_add_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return a + b; }                              \
-    static NAME##_t safe_sub_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return a - b; }                              \
-    static NAME##_t safe_mul_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return a * b; }                              \
-    static NAME##_t safe_div_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return b == 0 ? a : a / b; }                 \
-    static NAME##_t safe_mod_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return b == 0 ? a : a % b; }                 \
-    static NAME##_t safe_lshift_func_##NAME##_t_u_s(NAME##_t a, int b) { return b < 0 || b >= BITS ? a : a << b; }      \
-    static NAME##_t safe_lshift_func_##NAME##_t_u_u(NAME##_t a, unsigned int b) { return b >= BITS ? a : a << b; }      \
-    static NAME##_t safe_rshift_func_##NAME##_t_u_s(NAME##_t a, int b) { return b < 0 || b >= BITS ? a : a >> b; }      \
+#define CSMITH_UNSIGNED(NAME, BITS)                                                                                 \
+    static NAME##_t safe_unary_minus_func_##NAME##_t_u(NAME##_t a) { return 0 - a; }                                \
+    static NAME##_t safe_add_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return a + b; }                          \
+    static NAME##_t safe_sub_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return a - b; }                          \
+    static NAME##_t safe_mul_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return a * b; }                          \
+    static NAME##_t safe_div_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return b == 0 ? a : a / b; }             \
+    static NAME##_t safe_mod_func_##NAME##_t_u_u(NAME##_t a, NAME##_t b) { return b == 0 ? a : a % b; }             \
+    static NAME##_t safe_lshift_func_##NAME##_t_u_s(NAME##_t a, int b) { return b < 0 || b >= BITS ? a : a << b; }  \
+    static NAME##_t safe_lshift_func_##NAME##_t_u_u(NAME##_t a, unsigned int b) { return b >= BITS ? a : a << b; }  \
+    static NAME##_t safe_rshift_func_##NAME##_t_u_s(NAME##_t a, int b) { return b < 0 || b >= BITS ? a : a >> b; }  \
     static NAME##_t safe_rshift_func_##NAME##_t_u_u(NAME##_t a, unsigned int b) { return b >= BITS ? a : a >> b; }
 
 CSMITH_SIGNED(int8, unsigned int, INT16_MIN, 16)
@@ -52,7 +52,7 @@ CSMITH_UNSIGNED(uint16, 16)
 CSMITH_UNSIGNED(uint32, 32)
 CSMITH_UNSIGNED(uint64, 64)
 
-/* Not the polynomial that the name tells: a mix in which each bit of each value counts, and which costs little to run. */
+/* Not the polynomial that the name tells: a mix in which each bit counts, and which costs little to run. */
 static unsigned long crc32_context = 0xFFFFFFFFUL;
 
 static void csmith_mix(unsigned long word)

@@ -5,12 +5,11 @@
 int g;
 
 // FUNCTION: plain
-// HAS: /= .* \* 1/
 // HAS: /_g = 1/
 // HAS: /_g = 2/
-// HAS: end function
+// HAS: return y
 int plain(int x) {
-    int y = x * 1;
+    int y = x + 1;
     g = 1;
     g = 2;
     return y;

@@ -97,7 +97,8 @@ class TypeBuilder:
         declarator = parameter.type
         if isinstance(declarator, A.ArrayDecl):  # the size of the outermost dimension does not matter
             element = self.type_of(declarator.type)
-            return T.qualify(T.Pointer(element), self._bits(w for w in declarator.dim_quals or [] if isinstance(w, str)))
+            bits = self._bits(w for w in declarator.dim_quals or [] if isinstance(w, str))
+            return T.qualify(T.Pointer(element), bits)
         return self.adjusted(self.type_of(parameter))
 
     def _function(self, node, where):

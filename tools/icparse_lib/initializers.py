@@ -1,7 +1,8 @@
 """Initializers: braces, designators and strings to the scalars of an object.
 
-An initializer first becomes a nest of `Aggregate`s that follows the type; what it does not mention is missing there. The
-nest is then laid out as the constants of a static object, in layout order, or as the assignments of an automatic one.
+An initializer first becomes a nest of `Aggregate`s that follows the type; what it does not mention is missing there.
+The nest is then laid out as the constants of a static object, in layout order, or as the assignments of an automatic
+one.
 """
 from pycparser import c_ast as A
 

@@ -1,7 +1,7 @@
 """What a translation produces: trees, symbols, functions and the unit that holds them.
 
-The unit is the I-file in memory; `writer` gives it its bytes. Trees carry C types; numbers of types, symbols and files come
-into being when the unit is written.
+The unit is the I-file in memory; `writer` gives it its bytes. Trees carry C types; numbers of types, symbols and files
+come into being when the unit is written.
 """
 import os
 import re

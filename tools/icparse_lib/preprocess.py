@@ -11,6 +11,7 @@ HEADERS = os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "includ
 
 ASM = re.compile(r"\b(?:asm|__asm__|__asm)(?:\s+(?:volatile|__volatile__))?\s*(?=\()")
 TOKEN = re.compile(r'"(?:\\.|[^"\\\n])*"|\'(?:\\.|[^\'\\\n])*\'|^\#[^\n]*|[{}\n]|\b(?:__asm__|__asm|asm)\b', re.M)
+FILE_SCOPE_ASM = re.compile(r'\w+\s*(?:volatile\s*)?\(((?:\s*"(?:\\.|[^"\\])*")+)\s*\)\s*;')
 LINE_MARKER = re.compile(r'#\s*(?:line\s+)?(\d+)\s+"((?:\\.|[^"\\])*)"')
 PARSE_ERROR = re.compile(r"(.*?):(\d+):(?:(\d+):)?\s*(.*)", re.S)
 CPP_ERROR = re.compile(r"^(.*?):(\d+):(\d+): (?:fatal )?error: (.*)$", re.M)
@@ -55,7 +56,7 @@ def lift_file_scope_asm(text):
         elif word in "{}":
             depth += 1 if word == "{" else -1
         elif depth == 0 and word.strip("_") == "asm" and token.start() >= last:
-            found = re.compile(r'\w+\s*(?:volatile\s*)?\(((?:\s*"(?:\\.|[^"\\])*")+)\s*\)\s*;').match(text, token.start())
+            found = FILE_SCOPE_ASM.match(text, token.start())
             if found:
                 after = line + found[0].count("\n")
                 strings = " ".join(found[1].split("\n"))

@@ -24,7 +24,7 @@ class FunctionContext:
 
 
 class Translator:
-    """Translates one source file into a unit. `linked` maps names of external linkage to their symbols, over all files."""
+    """Translates one source file into a unit. `linked` maps names of external linkage to symbols, over all files."""
 
     def __init__(self, unit, linked, warnings=sys.stderr):
         self.unit, self.linked, self.warnings = unit, linked, warnings

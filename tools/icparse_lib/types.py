@@ -1,9 +1,9 @@
 """The C types of the target.
 
-A type is an immutable object with `size` and `align` in bits; the addressable unit is 16 bits, and char, short and int are
-one unit each. Typedefs and qualifiers are kept as layers, since the I-file names types as the source does; `strip` looks
-behind them. Two types are the same I-file type exactly if their `key`s are equal; records and enumerations are equal only
-to themselves.
+A type is an immutable object with `size` and `align` in bits; the addressable unit is 16 bits, and char, short and int
+are one unit each. Typedefs and qualifiers are kept as layers, since the I-file names types as the source does; `strip`
+looks behind them. Two types are the same I-file type exactly if their `key`s are equal; records and enumerations are
+equal only to themselves.
 """
 
 import itertools
@@ -153,7 +153,7 @@ class Record(Type):
         self.key, self.name = _identity(tag)
 
     def lay_out(self, members):
-        """Places the members. A bit-field never crosses a boundary of its declared type; width 0 goes to the next one."""
+        """Places the members. A bit-field never crosses a boundary of its declared type; width 0 goes to the next."""
         end = size = 0
         for member in members:
             start = 0 if self.is_union else end
@@ -337,7 +337,7 @@ def pointed_to(type_):
 
 
 def promote(type_, width=None):
-    """Integer promotion; `width` is that of a bit-field. A narrow unsigned type is as wide as int and so goes to unsigned."""
+    """Integer promotion; `width` is that of a bit-field. A narrow unsigned type, as wide as int, goes to unsigned."""
     if not is_integer(type_):
         return strip(type_)
     kind = as_integer(type_)

@@ -1,7 +1,7 @@
 """The bytes of an I-file.
 
-A file is a stream of records (kind, size, payload): header, functions, initializers, option sets, types, file names, global
-symbols. The header holds the sections' offsets and is put in place last.
+A file is a stream of records (kind, size, payload): header, functions, initializers, option sets, types, file names,
+global symbols. The header holds the sections' offsets and is put in place last.
 """
 from . import types as T
 from .model import Block, FunctionBody, Label, Op, Pragma, Statement, Text
@@ -74,7 +74,7 @@ class FileTable:
 
 
 class TypeTable:
-    """Types, numbered by first mention. A record's number is known before its members are, since it may refer to itself."""
+    """Types, numbered by first mention. A record has its number before its members, since it may refer to itself."""
 
     def __init__(self, files):
         self.files, self.numbers, self.types = files, {}, []

@@ -1,4 +1,4 @@
-/* float is IEEE single. double is IEEE double under the new ABI and single under the legacy one; long double is double. */
+/* float is IEEE single, long double IEEE double, and double the one under the legacy ABI, the other under the new. */
 #ifndef _FLOAT_H
 #define _FLOAT_H
 

@@ -154,7 +154,8 @@ struct MACHINE {
     std::vector<int64_t> at_exit;
     std::map<uint64_t, uint64_t> blocks, holes; // the heap's: address to size
 
-    [[noreturn]] void fail(int status, const std::string& text) const { throw EXEC_ERROR{status, text}; }
+    // Throws EXEC_ERROR with the function and line in work.
+    [[noreturn]] void fail(int status, const std::string& text) const;
     [[noreturn]] void bad_address(uint64_t address, uint64_t units) const;
     [[noreturn]] void unaligned(uint64_t address) const;
 

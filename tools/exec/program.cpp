@@ -7,6 +7,9 @@
 namespace {
 enum : int { class_static = 3, class_extern = 5 };
 
+// Behind each object, so that the address one past its end is no other object's.
+constexpr uint64_t gap = 1;
+
 bool is_function(const IC_SYMBOL* s) { return s->type && shape_of(s->type).rep == R_FUNC; }
 
 class INITIALIZER {
@@ -147,7 +150,7 @@ void PROGRAM::lay_out() {
         const uint64_t units = std::max<uint64_t>({shape.units, (s->size + 15) / 16, 1});
         uint64_t mask = std::max<uint64_t>(shape.align_mask, 3);
         while (s->align / 16 > mask + 1) mask = mask * 2 + 1;
-        places[s] = {B_ABS, static_cast<int64_t>(take(units, mask)), units};
+        places[s] = {B_ABS, static_cast<int64_t>(take(units + gap, mask)), units};
         objects.emplace(s->name, places[s]);
     };
     for (const IC_SYMBOL* s : unit.globals) enter(s);

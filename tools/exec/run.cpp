@@ -49,6 +49,17 @@ void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
 }
 } // namespace
 
+// The activations are on the host's stack: they are read here, before anything unwinds.
+void MACHINE::fail(int status, const std::string& text) const {
+    std::string where;
+    if (top) {
+        where = " (in " + top->function->name;
+        if (top->at && top->at->line) where += ", line " + std::to_string(top->at->line);
+        where += ")";
+    }
+    throw EXEC_ERROR{status, text + where};
+}
+
 int64_t MACHINE::invoke(FUNCTION& f, const int64_t* args) {
     const uintptr_t here_on_host = reinterpret_cast<uintptr_t>(__builtin_frame_address(0));
     if (here_on_host < host_stack_end + f.depth * host_bytes_a_level + host_stack_reserve)
@@ -91,13 +102,6 @@ int64_t MACHINE::call(int64_t address, const int64_t* args, const SHAPE* shapes,
 }
 
 namespace {
-std::string where(const MACHINE& m) {
-    if (!m.top) return "";
-    std::string text = " (in " + m.top->function->name;
-    if (m.top->at && m.top->at->line) text += ", line " + std::to_string(m.top->at->line);
-    return text + ")";
-}
-
 int run_main(PROGRAM& p) {
     MACHINE& m = p.m;
     FUNCTION* main = p.find_main();
@@ -143,7 +147,7 @@ EXEC_RESULT execute(const IC_UNIT& unit, const EXEC_OPTIONS& options, FILE* out,
         } catch (const EXEC_ERROR& e) {
             result.failed = true;
             result.status = e.status;
-            result.error = e.text + where(p.m);
+            result.error = e.text;
         }
     });
     std::fflush(out);

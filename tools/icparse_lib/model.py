@@ -104,6 +104,7 @@ class Unit:
         self.source_name = source_name
         self.symbols = []    # of file scope, in order
         self.items = []      # FunctionBody and Text of file scope, in order
+        self.tentative = []    # symbols that get zeros if no file initializes them
         self.option_sets = {}  # number: [word...]
         self.serial = 0
 

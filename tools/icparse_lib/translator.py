@@ -35,7 +35,6 @@ class Translator:
         self.initializers = Initializers(self)
         self.symbol_pragmas = pragmas.SymbolPragmas()
         self.next_is_interrupt = False  # the next function declared is an interrupt routine
-        self.tentative = []  # symbols that get zeros if no initializer comes
 
     # ---- Services
     def warn(self, where, message):
@@ -99,13 +98,6 @@ class Translator:
                 self._typedef(node)
             else:
                 self._global(node)
-        for symbol in self.tentative:
-            if symbol.initializer is None:
-                if not symbol.type.complete and T.is_array(symbol.type):
-                    symbol.type = T.Array(T.strip(symbol.type).element, 1)
-                if not symbol.type.complete:
-                    raise CompileError(symbol.position, f"'{symbol.name[1:]}' has incomplete type '{symbol.type}'")
-                symbol.initializer = self.initializers.static_items(symbol.type, None, symbol.position)
         self.symbol_pragmas.settle(self._pragma_symbol)
 
     def _pragma_symbol(self, name):
@@ -152,7 +144,7 @@ class Translator:
             target = symbol.link or symbol
             if target.klass == Symbol.EXTERNAL:
                 target.klass = Symbol.DEFINED
-            self.tentative.append(target)
+            self.unit.tentative.append(target)
         self._align(symbol, node)
 
     def _check_specifiers(self, node):
@@ -353,7 +345,14 @@ class Translator:
 
 
 def finish(unit):
-    """Drops the declarations that nothing uses."""
+    """Gives zeros to what no file initialized, and drops the declarations that nothing uses."""
+    for symbol in unit.tentative:
+        if symbol.initializer is None:
+            if not symbol.type.complete and T.is_array(symbol.type):
+                symbol.type = T.Array(T.strip(symbol.type).element, 1)
+            if not symbol.type.complete:
+                raise CompileError(symbol.position, f"'{symbol.name[1:]}' has incomplete type '{symbol.type}'")
+            symbol.initializer = Initializers(None).static_items(symbol.type, None, symbol.position)
     unit.symbols = [s for s in unit.symbols if s.used or s.klass != Symbol.EXTERNAL]
 
 

@@ -25,7 +25,7 @@ int header(int n) {
 // COUNT 1: _h
 int discarded(int x) {
     g + 1;
-    g * x;
+    g* x;
     return h;
 }
 

@@ -2,7 +2,7 @@
 // RUN: --opt_level=0
 #include <zrun.h>
 
-static int set(int *p) { return *p = 4; }
+static int set(int* p) { return *p = 4; }
 
 // FUNCTION: several
 // NOT: /\d+ never\b/

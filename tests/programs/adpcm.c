@@ -4,26 +4,31 @@
 #define N 64
 
 static const int index_step[8] = {-1, -1, -1, -1, 2, 4, 6, 8};
-static const int steps[49] = {
-    16, 17, 19, 21, 23, 25, 28, 31, 34, 37, 41, 45, 50, 55, 60, 66, 73, 80, 88, 97, 107, 118, 130, 143, 157,
-    173, 190, 209, 230, 253, 279, 307, 337, 371, 408, 449, 494, 544, 598, 658, 724, 796, 876, 963, 1060, 1166, 1282, 1411, 1552};
+static const int steps[49] = {16,  17,  19,  21,  23,  25,  28,  31,  34,  37,  41,   45,   50,   55,   60,  66,  73,
+                              80,  88,  97,  107, 118, 130, 143, 157, 173, 190, 209,  230,  253,  279,  307, 337, 371,
+                              408, 449, 494, 544, 598, 658, 724, 796, 876, 963, 1060, 1166, 1282, 1411, 1552};
 
-struct state { int value; int index; };
+struct state {
+    int value;
+    int index;
+};
 
 static int bounded(long v) { return v > 2047 ? 2047 : v < -2048 ? -2048 : (int)v; }
 
-static void update(struct state *s, unsigned code) {
+static void update(struct state* s, unsigned code) {
     int step = steps[s->index], delta = step >> 3;
     if (code & 4u) delta += step;
     if (code & 2u) delta += step >> 1;
     if (code & 1u) delta += step >> 2;
     s->value = bounded(code & 8u ? (long)s->value - delta : (long)s->value + delta);
     s->index += index_step[code & 7u];
-    if (s->index < 0) s->index = 0;
-    else if (s->index > 48) s->index = 48;
+    if (s->index < 0)
+        s->index = 0;
+    else if (s->index > 48)
+        s->index = 48;
 }
 
-static unsigned encode(struct state *s, int sample) {
+static unsigned encode(struct state* s, int sample) {
     int diff = sample - s->value, step = steps[s->index];
     unsigned code = 0, mask;
     if (diff < 0) {

@@ -2,18 +2,20 @@
 #include <zrun.h>
 
 static int global = 5, other = 7, array[8];
-static int *where = &global;
-struct pair { int a, b; };
+static int* where = &global;
+struct pair {
+    int a, b;
+};
 static struct pair pairs[3] = {{1, 2}, {3, 4}, {5, 6}};
 static long words[4];
 
-static int load_store_load(int *p, int *q) {
+static int load_store_load(int* p, int* q) {
     int first = *p;
     *q = first + 1;
     return first * 10 + *p;
 }
 
-static int kept_global(int *p) {
+static int kept_global(int* p) {
     int sum = global;
     *p = 100;
     sum += global;
@@ -28,18 +30,18 @@ static int through_where(int v) {
     return global;
 }
 
-static void copy_overlapping(int *to, const int *from, int n) {
+static void copy_overlapping(int* to, const int* from, int n) {
     while (n-- > 0) *to++ = *from++;
 }
 
-static int members(struct pair *p, struct pair *q) {
+static int members(struct pair* p, struct pair* q) {
     p->a = 1;
     q->b = 2;
     q->a = 3;
     return p->a * 10 + p->b;
 }
 
-static long loop_bound(long *n, long *out, int count) {
+static long loop_bound(long* n, long* out, int count) {
     int i;
     for (i = 0; i < *n && i < count; i++) out[i] = i + 2;
     return *n;
@@ -54,13 +56,13 @@ static int address_taken(void) {
     return x * 100 + y;
 }
 
-static void swap_in_place(int *a, int *b) {
+static void swap_in_place(int* a, int* b) {
     *a ^= *b;
     *b ^= *a;
     *a ^= *b;
 }
 
-static int sum_and_clear(int *restrict a, const int *restrict b, int n) {
+static int sum_and_clear(int* restrict a, const int* restrict b, int n) {
     int s = 0, i;
     for (i = 0; i < n; i++) {
         a[i] = 0;
@@ -69,7 +71,7 @@ static int sum_and_clear(int *restrict a, const int *restrict b, int n) {
     return s;
 }
 
-static int invariant(int *a, int *factor, int n) {
+static int invariant(int* a, int* factor, int n) {
     int i, s = 0;
     for (i = 0; i < n; i++) {
         a[i] = *factor * i;

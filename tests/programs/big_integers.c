@@ -3,16 +3,19 @@
 
 #define WORDS 16
 
-struct big { unsigned w[WORDS]; int n; };
+struct big {
+    unsigned w[WORDS];
+    int n;
+};
 
-static void set(struct big *b, unsigned v) {
+static void set(struct big* b, unsigned v) {
     int i;
     for (i = 0; i < WORDS; i++) b->w[i] = 0;
     b->w[0] = v;
     b->n = v != 0;
 }
 
-static void times(struct big *b, unsigned k) {
+static void times(struct big* b, unsigned k) {
     unsigned long carry = 0;
     int i;
     for (i = 0; i < b->n; i++) {
@@ -23,7 +26,7 @@ static void times(struct big *b, unsigned k) {
     if (carry) b->w[b->n++] = (unsigned)carry;
 }
 
-static unsigned over(struct big *b, unsigned k) {
+static unsigned over(struct big* b, unsigned k) {
     unsigned long rest = 0;
     int i;
     for (i = b->n - 1; i >= 0; i--) {
@@ -35,7 +38,7 @@ static unsigned over(struct big *b, unsigned k) {
     return (unsigned)rest;
 }
 
-static void add(struct big *a, const struct big *b) {
+static void add(struct big* a, const struct big* b) {
     unsigned carry = 0;
     int i, n = a->n > b->n ? a->n : b->n;
     for (i = 0; i < n; i++) {
@@ -47,7 +50,7 @@ static void add(struct big *a, const struct big *b) {
     a->n = n;
 }
 
-static int subtract(struct big *a, const struct big *b) {
+static int subtract(struct big* a, const struct big* b) {
     unsigned borrow = 0;
     int i;
     for (i = 0; i < WORDS; i++) {
@@ -59,7 +62,7 @@ static int subtract(struct big *a, const struct big *b) {
     return (int)borrow;
 }
 
-static void multiply(struct big *r, const struct big *a, const struct big *b) {
+static void multiply(struct big* r, const struct big* a, const struct big* b) {
     int i, j;
     set(r, 0);
     for (i = 0; i < a->n; i++) {

@@ -12,11 +12,9 @@ static struct section cascade[3] = {
     {16384, 0, -16384, 3000, 9000, 0, 0, 0, 0},
 };
 
-static int clip(long v) {
-    return v > 32767L ? 32767 : v < -32768L ? -32767 - 1 : (int)v;
-}
+static int clip(long v) { return v > 32767L ? 32767 : v < -32768L ? -32767 - 1 : (int)v; }
 
-static int run_section(struct section *s, int x) {
+static int run_section(struct section* s, int x) {
     long sum = (long)s->b0 * x;
     int y;
     sum += (long)s->b1 * s->x1;
@@ -38,12 +36,12 @@ static int run_cascade(int x) {
 }
 
 static void reset(void) {
-    struct section *s;
+    struct section* s;
     for (s = cascade; s != cascade + 3; s++) s->x1 = s->x2 = s->y1 = s->y2 = 0;
 }
 
 /* Direct form two keeps two states of 32 bits. */
-static long form_two(const int *x, int n) {
+static long form_two(const int* x, int n) {
     long w1 = 0, w2 = 0, check = 0;
     int i;
     for (i = 0; i < n; i++) {

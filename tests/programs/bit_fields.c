@@ -1,15 +1,37 @@
 // Bit-fields: signed and unsigned, crossing and filling words, compound assignment, packing, arrays of them.
 #include <zrun.h>
 
-struct flags { unsigned a : 1, b : 2, c : 3, d : 4; unsigned e : 6; };
-struct signs { int s1 : 2; int s2 : 5; int s3 : 9; int whole : 16; };
-struct gaps { unsigned x : 7; unsigned : 0; unsigned y : 9; unsigned : 3; unsigned z : 4; };
-struct wide { unsigned long lo : 20; unsigned long hi : 12; long sg : 24; };
-struct record { unsigned kind : 3; int value : 10; unsigned last : 1; };
+struct flags {
+    unsigned a : 1, b : 2, c : 3, d : 4;
+    unsigned e : 6;
+};
+struct signs {
+    int s1 : 2;
+    int s2 : 5;
+    int s3 : 9;
+    int whole : 16;
+};
+struct gaps {
+    unsigned x : 7;
+    unsigned : 0;
+    unsigned y : 9;
+    unsigned : 3;
+    unsigned z : 4;
+};
+struct wide {
+    unsigned long lo : 20;
+    unsigned long hi : 12;
+    long sg : 24;
+};
+struct record {
+    unsigned kind : 3;
+    int value : 10;
+    unsigned last : 1;
+};
 
 static struct flags shared;
 
-static void fill(struct flags *f, unsigned v) {
+static void fill(struct flags* f, unsigned v) {
     f->a = v & 1u;
     f->b = (v >> 1) & 3u;
     f->c = (v >> 3) & 7u;
@@ -17,11 +39,11 @@ static void fill(struct flags *f, unsigned v) {
     f->e = (v >> 10) & 63u;
 }
 
-static unsigned gather(const struct flags *f) {
+static unsigned gather(const struct flags* f) {
     return f->a | f->b << 1 | f->c << 3 | f->d << 6 | (unsigned)f->e << 10;
 }
 
-static void count(struct flags *f, int n) {
+static void count(struct flags* f, int n) {
     while (n-- > 0) {
         f->c++;
         f->d += 3u;
@@ -31,7 +53,7 @@ static void count(struct flags *f, int n) {
     }
 }
 
-static int sum(const struct record *r) {
+static int sum(const struct record* r) {
     int s = 0;
     do {
         s += r->kind == 5u ? r->value : -r->value;
@@ -39,7 +61,7 @@ static int sum(const struct record *r) {
     return s;
 }
 
-static long sign_range(struct signs *s, int v) {
+static long sign_range(struct signs* s, int v) {
     s->s1 = v & 1;
     s->s2 = v % 16;
     s->s3 = v % 256;

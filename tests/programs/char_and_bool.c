@@ -12,9 +12,7 @@ static truth is_set(int v, int bit) { return v & (1 << bit); }
 static truth both(truth a, truth b) { return a && b; }
 static int as_number(truth t) { return t + t; }
 
-static enum day next(enum day d) {
-    return d == WED ? SUN : d == SUN ? MON : (enum day)(d + 1);
-}
+static enum day next(enum day d) { return d == WED ? SUN : d == SUN ? MON : (enum day)(d + 1); }
 
 static int sieve(int limit) {
     int i, j, n = 0;
@@ -27,13 +25,13 @@ static int sieve(int limit) {
     return n;
 }
 
-static unsigned checksum(const unsigned char *p, int n) {
+static unsigned checksum(const unsigned char* p, int n) {
     unsigned char sum = 0;
     while (n-- > 0) sum = (unsigned char)((sum + *p++) & 0xFF);
     return sum;
 }
 
-static int letters(const char *s, int *vowels) {
+static int letters(const char* s, int* vowels) {
     int n = 0;
     *vowels = 0;
     for (; *s; s++) {
@@ -47,7 +45,7 @@ static int letters(const char *s, int *vowels) {
 
 static int clamp(int v) { return v < 0 ? 0 : v > 255 ? 255 : v; }
 
-static void brighten(unsigned char *p, int n, int by) {
+static void brighten(unsigned char* p, int n, int by) {
     int i;
     for (i = 0; i < n; i++) p[i] = (unsigned char)clamp(p[i] + by);
 }

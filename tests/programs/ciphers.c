@@ -29,7 +29,7 @@ static void decipher(u32 v[2], const u32 k[4]) {
     v[1] = b;
 }
 
-static void speck(unsigned *x, unsigned *y, const unsigned key[4]) {
+static void speck(unsigned* x, unsigned* y, const unsigned key[4]) {
     unsigned k = key[0], l[3], a = *x, b = *y;
     int i;
     for (i = 0; i < 3; i++) l[i] = key[i + 1];
@@ -45,7 +45,7 @@ static void speck(unsigned *x, unsigned *y, const unsigned key[4]) {
     *y = b;
 }
 
-static void quarter(u32 *a, u32 *b, u32 *c, u32 *d) {
+static void quarter(u32* a, u32* b, u32* c, u32* d) {
     *a += *b;
     *d = left(*d ^ *a, 16);
     *c += *d;
@@ -62,10 +62,14 @@ static void compress(u32 h[5], const u32 block[16]) {
     for (i = 0; i < 80; i++) w[i] = i < 16 ? block[i] : left(w[i - 3] ^ w[i - 8] ^ w[i - 14] ^ w[i - 16], 1);
     for (i = 0; i < 80; i++) {
         u32 f, k, t;
-        if (i < 20) f = (b & c) | (~b & d), k = 0x5A827999UL;
-        else if (i < 40) f = b ^ c ^ d, k = 0x6ED9EBA1UL;
-        else if (i < 60) f = (b & c) | (b & d) | (c & d), k = 0x8F1BBCDCUL;
-        else f = b ^ c ^ d, k = 0xCA62C1D6UL;
+        if (i < 20)
+            f = (b & c) | (~b & d), k = 0x5A827999UL;
+        else if (i < 40)
+            f = b ^ c ^ d, k = 0x6ED9EBA1UL;
+        else if (i < 60)
+            f = (b & c) | (b & d) | (c & d), k = 0x8F1BBCDCUL;
+        else
+            f = b ^ c ^ d, k = 0xCA62C1D6UL;
         t = left(a, 5) + f + e + k + w[i];
         e = d;
         d = c;

@@ -1,7 +1,8 @@
 // Comparisons at each width and sign, with constants at the edge of ranges, in chains, as values and in branches.
 #include <zrun.h>
 
-#define ALL(a, b) ((a) < (b)) | ((a) <= (b)) << 1 | ((a) > (b)) << 2 | ((a) >= (b)) << 3 | ((a) == (b)) << 4 | ((a) != (b)) << 5
+#define ALL(a, b)                                                                                                      \
+    ((a) < (b)) | ((a) <= (b)) << 1 | ((a) > (b)) << 2 | ((a) >= (b)) << 3 | ((a) == (b)) << 4 | ((a) != (b)) << 5
 
 static int by_int(int a, int b) { return ALL(a, b); }
 static int by_unsigned(unsigned a, unsigned b) { return ALL(a, b); }
@@ -36,7 +37,8 @@ static int unsigned_edges(unsigned x) {
 }
 
 static int ranges(int x) {
-    return (x >= 10 && x <= 20) + 2 * (x < 10 || x > 20) + 4 * ((unsigned)(x - 10) <= 10u) + 8 * (x > 5 && x < 6) + 16 * (x > 5 || x < 6);
+    return (x >= 10 && x <= 20) + 2 * (x < 10 || x > 20) + 4 * ((unsigned)(x - 10) <= 10u) + 8 * (x > 5 && x < 6) +
+           16 * (x > 5 || x < 6);
 }
 
 static int three_way(long a, long b) { return a < b ? -1 : a > b; }
@@ -54,7 +56,8 @@ static int chain(int a, int b, int c) {
 }
 
 static int offsets(int x) {
-    return (x + 5 > 10) + 2 * (x - 3 == 4) + 4 * (10 - x < 3) + 8 * (2 * x == 14) + 16 * (-x > 0) + 32 * ((x & 7) == 7) + 64 * (x % 2 != 0);
+    return (x + 5 > 10) + 2 * (x - 3 == 4) + 4 * (10 - x < 3) + 8 * (2 * x == 14) + 16 * (-x > 0) +
+           32 * ((x & 7) == 7) + 64 * (x % 2 != 0);
 }
 
 int main(void) {

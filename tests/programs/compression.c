@@ -5,7 +5,7 @@
 
 static unsigned char plain[SIZE], packed[2 * SIZE], expanded[SIZE + 20];
 
-static int pack_runs(const unsigned char *from, int n, unsigned char *to) {
+static int pack_runs(const unsigned char* from, int n, unsigned char* to) {
     int made = 0, i = 0;
     while (i < n) {
         int run = 1;
@@ -20,9 +20,9 @@ static int pack_runs(const unsigned char *from, int n, unsigned char *to) {
     return made;
 }
 
-static int expand_runs(const unsigned char *from, int n, unsigned char *to) {
-    const unsigned char *end = from + n;
-    unsigned char *start = to;
+static int expand_runs(const unsigned char* from, int n, unsigned char* to) {
+    const unsigned char* end = from + n;
+    unsigned char* start = to;
     while (from != end) {
         int c = *from++;
         if (c < 192) {
@@ -35,7 +35,7 @@ static int expand_runs(const unsigned char *from, int n, unsigned char *to) {
     return (int)(to - start);
 }
 
-static int longest(const unsigned char *s, int at, int n, int *back) {
+static int longest(const unsigned char* s, int at, int n, int* back) {
     int best = 0, d;
     for (d = 1; d <= 31 && d <= at; d++) {
         int l = 0;
@@ -48,7 +48,7 @@ static int longest(const unsigned char *s, int at, int n, int *back) {
     return best;
 }
 
-static int pack_window(const unsigned char *s, int n, unsigned char *to) {
+static int pack_window(const unsigned char* s, int n, unsigned char* to) {
     int made = 0, at = 0;
     while (at < n) {
         int back = 0, l = longest(s, at, n, &back);
@@ -62,7 +62,7 @@ static int pack_window(const unsigned char *s, int n, unsigned char *to) {
     return made;
 }
 
-static int expand_window(const unsigned char *from, int n, unsigned char *to) {
+static int expand_window(const unsigned char* from, int n, unsigned char* to) {
     int made = 0;
     while (n-- > 0) {
         unsigned c = *from++;
@@ -82,7 +82,7 @@ static int differ(int n) {
     return 0;
 }
 
-static unsigned digest(const unsigned char *p, int n) {
+static unsigned digest(const unsigned char* p, int n) {
     unsigned d = 0;
     while (n-- > 0) d = (d << 5 | d >> 11) + *p++;
     return d;
@@ -92,7 +92,11 @@ int main(void) {
     int kind, i, n;
     for (kind = 0; kind < 4; kind++) {
         for (i = 0; i < SIZE; i++) {
-            int v = kind == 0 ? i / 20 : kind == 1 ? i * 7 % 120 : kind == 2 ? i % 9 < 8 ? 97 + i % 9 % 3 : 100 : (i & 24) ? 3 : i;
+            int v = kind == 0   ? i / 20
+                    : kind == 1 ? i * 7 % 120
+                    : kind == 2 ? i % 9 < 8 ? 97 + i % 9 % 3 : 100
+                    : (i & 24)  ? 3
+                                : i;
             plain[i] = (unsigned char)(v & 127);
         }
         n = pack_runs(plain, SIZE, packed);

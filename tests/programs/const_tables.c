@@ -4,11 +4,16 @@
 static const int curve[9] = {0, 1000, 1900, 2700, 3400, 4000, 4500, 4900, 5200};
 static const unsigned char nibble_bits[16] = {0, 1, 1, 2, 1, 2, 2, 3, 1, 2, 2, 3, 2, 3, 3, 4};
 static const unsigned char box[16] = {0xC, 5, 6, 0xB, 9, 0, 0xA, 0xD, 3, 0xE, 0xF, 8, 4, 7, 1, 2};
-static const int days[2][12] = {{31, 28, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31}, {31, 29, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31}};
-static const int cube[2][3][4] = {{{1, 2, 3, 4}, {5, 6, 7, 8}, {9, 10, 11, 12}}, {{13, 14, 15, 16}, {17, 18, 19, 20}, {21, 22, 23, 24}}};
+static const int days[2][12] = {{31, 28, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31},
+                                {31, 29, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31}};
+static const int cube[2][3][4] = {{{1, 2, 3, 4}, {5, 6, 7, 8}, {9, 10, 11, 12}},
+                                  {{13, 14, 15, 16}, {17, 18, 19, 20}, {21, 22, 23, 24}}};
 static const int order[] = {3, 1, 4, 0, 2};
 static const float scale[] = {0.5F, 0.25F, 2.0F};
-static const struct { int key; const char *name; } dictionary[] = {{10, "ten"}, {20, "twenty"}, {35, "more"}, {90, "most"}};
+static const struct {
+    int key;
+    const char* name;
+} dictionary[] = {{10, "ten"}, {20, "twenty"}, {35, "more"}, {90, "most"}};
 
 static int interpolate(int x) { /* 256 to the step */
     int i = x >> 8, f = x & 255;
@@ -21,8 +26,10 @@ static int find_inverse(int y) {
     int low = 0, high = 2048;
     while (low < high) {
         int mid = low + (high - low) / 2;
-        if (interpolate(mid) < y) low = mid + 1;
-        else high = mid;
+        if (interpolate(mid) < y)
+            low = mid + 1;
+        else
+            high = mid;
     }
     return low;
 }
@@ -49,7 +56,7 @@ static unsigned substitute(unsigned v, int rounds) {
 static int leap(int y) { return (y % 4 == 0 && y % 100 != 0) || y % 400 == 0; }
 
 static int day_of_year(int y, int m, int d) {
-    const int *table = days[leap(y)];
+    const int* table = days[leap(y)];
     int n = d, i;
     for (i = 0; i < m - 1; i++) n += table[i];
     return n;
@@ -61,13 +68,15 @@ static int weekday(int y, int m, int d) {
     return (y + y / 4 - y / 100 + y / 400 + offset[m - 1] + d) % 7;
 }
 
-static const char *look_up(int key) {
+static const char* look_up(int key) {
     int low = 0, high = (int)(sizeof dictionary / sizeof dictionary[0]) - 1;
     while (low <= high) {
         int mid = (low + high) / 2;
         if (dictionary[mid].key == key) return dictionary[mid].name;
-        if (dictionary[mid].key < key) low = mid + 1;
-        else high = mid - 1;
+        if (dictionary[mid].key < key)
+            low = mid + 1;
+        else
+            high = mid - 1;
     }
     return "none";
 }

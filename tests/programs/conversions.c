@@ -1,8 +1,9 @@
 // Conversions between integers of all widths and floats, at values where truncation and rounding show.
 #include <zrun.h>
 
-static const float floats[] = {0.0F, 0.5F, -0.5F, 0.99999994F, 1.5F, -1.5F, 255.75F, 32767.0F, -32768.0F, 32766.9F,
-                               8388607.5F, 16777216.0F, 16777218.0F, 2147483520.0F, -2147483648.0F, 4294967040.0F, 1.0e18F};
+static const float floats[] = {0.0F,        0.5F,          -0.5F,          0.99999994F,   1.5F,       -1.5F,
+                               255.75F,     32767.0F,      -32768.0F,      32766.9F,      8388607.5F, 16777216.0F,
+                               16777218.0F, 2147483520.0F, -2147483648.0F, 4294967040.0F, 1.0e18F};
 
 static void from_float(float f) {
     if (f > -32769.0F && f < 32768.0F) put_i16((int)f);
@@ -42,8 +43,10 @@ static long mixed(int i, unsigned u, long l, float f) {
 }
 
 int main(void) {
-    static const long longs[] = {0L, 1L, -1L, 16777215L, 16777217L, 16777219L, -16777217L, 33554434L, 2147483647L, -2147483647L - 1};
-    static const long long wides[] = {0LL, 9007199254740993LL, -9007199254740993LL, 9223372036854775807LL, 36028797018963969LL, -1LL};
+    static const long longs[] = {0L,        1L,         -1L,       16777215L,   16777217L,
+                                 16777219L, -16777217L, 33554434L, 2147483647L, -2147483647L - 1};
+    static const long long wides[] = {
+        0LL, 9007199254740993LL, -9007199254740993LL, 9223372036854775807LL, 36028797018963969LL, -1LL};
     unsigned i;
     float f = 3.75F;
     int k = 10;

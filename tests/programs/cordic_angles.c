@@ -7,7 +7,7 @@
 static const int angles[STEPS] = {3217, 1899, 1003, 509, 256, 128, 64, 32, 16, 8, 4, 2, 1};
 static const int hyper[STEPS] = {0, 2250, 1046, 515, 256, 128, 64, 32, 16, 8, 4, 2, 1};
 
-static void rotate(int angle, int *x, int *y) {
+static void rotate(int angle, int* x, int* y) {
     int i, cx = 9949, cy = 0; /* 16384 over the gain */
     for (i = 0; i < STEPS; i++) {
         int nx = cx, ny = cy;
@@ -27,7 +27,7 @@ static void rotate(int angle, int *x, int *y) {
     *y = cy;
 }
 
-static int vector(int x, int y, int *length) {
+static int vector(int x, int y, int* length) {
     int angle = 0, i;
     if (x < 0) {
         x = -x;
@@ -61,8 +61,10 @@ static int root(int v) { /* of v / 4096, result by 4096 */
             x -= y >> i;
             y -= t >> i;
         }
-        if (i == repeat) repeat = 3 * repeat + 1;
-        else i++;
+        if (i == repeat)
+            repeat = 3 * repeat + 1;
+        else
+            i++;
     }
     return (int)((long)x * 19784L >> 14);
 }

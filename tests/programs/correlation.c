@@ -7,7 +7,7 @@
 static int a[N], b[N];
 static long r[LAGS];
 
-static void autocorrelate(const int *x, int n, long *out, int lags) {
+static void autocorrelate(const int* x, int n, long* out, int lags) {
     int lag, i;
     for (lag = 0; lag < lags; lag++) {
         long sum = 0;
@@ -16,7 +16,7 @@ static void autocorrelate(const int *x, int n, long *out, int lags) {
     }
 }
 
-static int best_lag(const int *x, const int *y, int n, int max, long *score) {
+static int best_lag(const int* x, const int* y, int n, int max, long* score) {
     int lag, i, best = 0;
     *score = -2147483647L - 1;
     for (lag = -max; lag <= max; ++lag) {
@@ -32,7 +32,7 @@ static int best_lag(const int *x, const int *y, int n, int max, long *score) {
 }
 
 /* Reflection coefficients of a predictor, fractions of 2 to the 12th. */
-static int levinson(const long *rr, int order, int *k) {
+static int levinson(const long* rr, int order, int* k) {
     long coef[LAGS], next[LAGS], err = rr[0] >> 4;
     int i, j;
     if (err == 0) return 0;

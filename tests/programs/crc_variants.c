@@ -4,7 +4,7 @@
 static const unsigned message[] = {0x31, 0x32, 0x33, 0x34, 0x35, 0x36, 0x37, 0x38, 0x39};
 #define LENGTH (int)(sizeof message / sizeof message[0])
 
-static unsigned crc16_bits(const unsigned *p, int n, unsigned poly, unsigned start) {
+static unsigned crc16_bits(const unsigned* p, int n, unsigned poly, unsigned start) {
     unsigned crc = start;
     while (n-- > 0) {
         int bit;
@@ -14,7 +14,7 @@ static unsigned crc16_bits(const unsigned *p, int n, unsigned poly, unsigned sta
     return crc;
 }
 
-static unsigned crc16_reflected(const unsigned *p, int n) {
+static unsigned crc16_reflected(const unsigned* p, int n) {
     unsigned crc = 0xFFFFu;
     int i, bit;
     for (i = 0; i < n; i++) {
@@ -40,13 +40,13 @@ static void make_table(void) {
     }
 }
 
-static unsigned long crc32(const unsigned *p, int n) {
+static unsigned long crc32(const unsigned* p, int n) {
     unsigned long c = 0xFFFFFFFFUL;
     while (n--) c = table[(c ^ *p++) & 0xFFUL] ^ c >> 8;
     return c ^ 0xFFFFFFFFUL;
 }
 
-static unsigned long crc32_nibbles(const unsigned *p, int n) {
+static unsigned long crc32_nibbles(const unsigned* p, int n) {
     unsigned long c = ~0UL;
     int i;
     for (i = 0; i < n; i++) {
@@ -57,7 +57,7 @@ static unsigned long crc32_nibbles(const unsigned *p, int n) {
     return ~c;
 }
 
-static unsigned crc8(const unsigned *p, int n) {
+static unsigned crc8(const unsigned* p, int n) {
     unsigned crc = 0;
     int i, k;
     for (i = 0; i < n; i++) {
@@ -70,7 +70,7 @@ static unsigned crc8(const unsigned *p, int n) {
     return crc;
 }
 
-static unsigned long adler(const unsigned *p, int n) {
+static unsigned long adler(const unsigned* p, int n) {
     unsigned long a = 1, b = 0;
     int i;
     for (i = 0; i < n; i++) {

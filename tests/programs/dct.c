@@ -31,7 +31,7 @@ static void backward(const int in[8], int out[8]) {
     }
 }
 
-static void both_ways(void (*one)(const int *, int *), int m[8][8]) {
+static void both_ways(void (*one)(const int*, int*), int m[8][8]) {
     int i, j, line[8], out[8];
     for (i = 0; i < 8; i++) {
         one(m[i], out);
@@ -49,13 +49,19 @@ static void make_zigzag(void) {
     for (i = 0; i < 64; i++) {
         zigzag[i] = (unsigned char)(y * 8 + x);
         if (up) {
-            if (x == 7) y++, up = 0;
-            else if (y == 0) x++, up = 0;
-            else x++, y--;
+            if (x == 7)
+                y++, up = 0;
+            else if (y == 0)
+                x++, up = 0;
+            else
+                x++, y--;
         } else {
-            if (y == 7) x++, up = 1;
-            else if (x == 0) y++, up = 1;
-            else x--, y++;
+            if (y == 7)
+                x++, up = 1;
+            else if (x == 0)
+                y++, up = 1;
+            else
+                x--, y++;
         }
     }
 }
@@ -67,9 +73,10 @@ int main(void) {
         for (j = 0; j < 8; j++) coefficients[i][j] = block[i][j] = (i - 3) * 12 + (j * j - 20) * 2 + (i == j ? 30 : 0);
     both_ways(forward, coefficients);
     for (i = 0; i < 64; i++) {
-        int *c = &coefficients[zigzag[i] >> 3][zigzag[i] & 7];
+        int* c = &coefficients[zigzag[i] >> 3][zigzag[i] & 7];
         int q = *c / (4 + i / 8);
-        if (q == 0) run++;
+        if (q == 0)
+            run++;
         else {
             put_i16(run);
             put_i16(q);

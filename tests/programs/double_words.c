@@ -3,7 +3,10 @@
 
 typedef long double real;
 
-union image { real value; unsigned long long bits; };
+union image {
+    real value;
+    unsigned long long bits;
+};
 
 static unsigned long long image(real v) {
     union image u;

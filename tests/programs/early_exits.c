@@ -7,14 +7,14 @@ static int touch(int v) {
     return v;
 }
 
-static int search(const int *a, int n, int key) {
+static int search(const int* a, int n, int key) {
     int i;
     for (i = 0; i < n; i++)
         if (a[i] == key) break;
     return i == n ? -1 : i;
 }
 
-static int sentinel(int *a, int n, int key) {
+static int sentinel(int* a, int n, int key) {
     int i = 0, kept = a[n];
     a[n] = key;
     while (a[i] != key) i++;
@@ -22,7 +22,7 @@ static int sentinel(int *a, int n, int key) {
     return i < n ? i : -1;
 }
 
-static int first_repeat(const int *a, int n) {
+static int first_repeat(const int* a, int n) {
     int i, j;
     for (i = 1; i < n; i++)
         for (j = 0; j < i; j++)
@@ -30,7 +30,7 @@ static int first_repeat(const int *a, int n) {
     return -1;
 }
 
-static int skip_some(const int *a, int n) {
+static int skip_some(const int* a, int n) {
     int i, s = 0;
     for (i = 0; i < n; i++) {
         if (a[i] & 1) continue;
@@ -44,7 +44,7 @@ static int skip_some(const int *a, int n) {
     return s * 10 + i % 10;
 }
 
-static int flag_loop(const int *a, int n) {
+static int flag_loop(const int* a, int n) {
     int going = 1, i = 0, s = 0;
     while (going && i < n) {
         s += a[i];
@@ -84,7 +84,7 @@ static int collatz(unsigned long v, int limit) {
     }
 }
 
-static int last_before(const int *a, int n, int bound) {
+static int last_before(const int* a, int n, int bound) {
     int last = -1;
     while (n-- > 0) {
         if (a[n] >= bound) continue;

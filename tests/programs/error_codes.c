@@ -48,13 +48,13 @@ static void make_field(void) {
 static unsigned multiply(unsigned a, unsigned b) { return a && b ? power[logarithm[a] + logarithm[b]] : 0u; }
 static unsigned divide(unsigned a, unsigned b) { return a ? power[logarithm[a] + 15 - logarithm[b]] : 0u; }
 
-static unsigned evaluate(const unsigned char *word, int n, unsigned x) {
+static unsigned evaluate(const unsigned char* word, int n, unsigned x) {
     unsigned r = 0;
     while (n-- > 0) r = multiply(r, x) ^ word[n];
     return r;
 }
 
-static void encode_rs(unsigned char *word) { /* two checks in word[0..1], eleven symbols above */
+static void encode_rs(unsigned char* word) {     /* two checks in word[0..1], eleven symbols above */
     static const unsigned generator[2] = {8, 6}; /* (x + 2)(x + 4) */
     unsigned r0 = 0, r1 = 0;
     int i;
@@ -67,7 +67,7 @@ static void encode_rs(unsigned char *word) { /* two checks in word[0..1], eleven
     word[1] = (unsigned char)r1;
 }
 
-static int correct_rs(unsigned char *word) {
+static int correct_rs(unsigned char* word) {
     unsigned s1 = evaluate(word, 13, 2), s2 = evaluate(word, 13, 4), where;
     if (!s1 && !s2) return 0;
     if (!s1 || !s2) return -1;
@@ -85,7 +85,8 @@ int main(void) {
         for (e = 0; e < 8; e++) wrong += decode74(encode74(d) ^ (e ? 1u << (e - 1) : 0u)) != d;
     put_u32(wrong);
     put_u32(encode74(11));
-    for (d = 0; d < 2048; d += 97) wrong += (unsigned)(syndrome(encode15(d), 15) != 0) + 2u * (syndrome(encode15(d) ^ 64u, 15) != 7);
+    for (d = 0; d < 2048; d += 97)
+        wrong += (unsigned)(syndrome(encode15(d), 15) != 0) + 2u * (syndrome(encode15(d) ^ 64u, 15) != 7);
     put_u32(wrong);
     put_u32(encode15(1234));
     make_field();

@@ -44,9 +44,14 @@ static int level_of(char c) {
     switch (c) {
     case '|': return 1;
     case '&': return 2;
-    case '<': case '>': case '=': return 3;
-    case '+': case '-': return 4;
-    case '*': case '/': case '%': return 5;
+    case '<':
+    case '>':
+    case '=': return 3;
+    case '+':
+    case '-': return 4;
+    case '*':
+    case '/':
+    case '%': return 5;
     case '^': return 6;
     }
     return 0;
@@ -92,9 +97,9 @@ static long expression(int level) {
 }
 
 int main(void) {
-    static const char *const inputs[] = {
-        "1+2*3", "(1+2)*3", "2^3^2", "100/7%4", "-2^2", "~5&12|1", "1<2=1", "10 - 4 - 3", "((((7))))", "!0+!5",
-        "65536*3+1", "8/0", "2*(3+", "4 4", "", "1 + + 2", "(1))", "5%0+1", "-(-(-3))"};
+    static const char* const inputs[] = {"1+2*3",      "(1+2)*3",   "2^3^2", "100/7%4",   "-2^2",    "~5&12|1", "1<2=1",
+                                         "10 - 4 - 3", "((((7))))", "!0+!5", "65536*3+1", "8/0",     "2*(3+",   "4 4",
+                                         "",           "1 + + 2",   "(1))",  "5%0+1",     "-(-(-3))"};
     unsigned i;
     for (i = 0; i < sizeof inputs / sizeof inputs[0]; i++) {
         long v;

@@ -6,7 +6,7 @@ static const int values[] = {0, 1, -1, 2, -2, 7, -7, 255, 256, 16383, 16384, 327
 
 static int fits(long v) { return v >= -32768L && v <= 32767L; }
 
-static void pair(int a, int b, unsigned long *d) {
+static void pair(int a, int b, unsigned long* d) {
     unsigned ua = (unsigned)a, ub = (unsigned)b;
     unsigned long h = *d;
     if (fits((long)a + b)) h = h * 31UL + (unsigned long)(a + b);
@@ -18,7 +18,8 @@ static void pair(int a, int b, unsigned long *d) {
     h = h * 31UL + (unsigned long)(ua * ub);
     if (ub != 0) h = h * 31UL + ua / ub + 5UL * (ua % ub);
     h = h * 31UL + (ua & ub) + 2UL * (ua | ub) + 4UL * (ua ^ ub) + 8UL * ~ua;
-    h = h * 31UL + (unsigned long)((a < b) | (a <= b) << 1 | (a > b) << 2 | (a >= b) << 3 | (a == b) << 4 | (a != b) << 5);
+    h = h * 31UL +
+        (unsigned long)((a < b) | (a <= b) << 1 | (a > b) << 2 | (a >= b) << 3 | (a == b) << 4 | (a != b) << 5);
     h = h * 31UL + (unsigned long)((ua < ub) | (ua <= ub) << 1 | (ua > ub) << 2 | (ua >= ub) << 3);
     *d = h;
 }

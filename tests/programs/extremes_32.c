@@ -1,7 +1,9 @@
 // 32-bit arithmetic at its extremes, both signs, and mixed with 16 bits.
 #include <zrun.h>
 
-static const long values[] = {0L, 1L, -1L, 10L, -10L, 32767L, -32768L, 65535L, 65536L, -65537L, 46340L, 46341L, 1073741824L, 2147483647L, -2147483647L, -2147483647L - 1};
+static const long values[] = {
+    0L,     1L,      -1L,    10L,    -10L,        32767L,      -32768L,      65535L,
+    65536L, -65537L, 46340L, 46341L, 1073741824L, 2147483647L, -2147483647L, -2147483647L - 1};
 #define COUNT (sizeof values / sizeof values[0])
 
 static int fits(long long v) { return v >= -2147483647LL - 1 && v <= 2147483647LL; }

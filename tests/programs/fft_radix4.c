@@ -3,7 +3,9 @@
 
 #define N 64
 
-struct complex { float re, im; };
+struct complex {
+    float re, im;
+};
 
 static struct complex data[N], twiddle[N];
 
@@ -30,7 +32,7 @@ static struct complex mul(struct complex a, struct complex b) {
     return r;
 }
 
-static void butterfly(struct complex *p, int step) {
+static void butterfly(struct complex* p, int step) {
     struct complex a = p[0], b = p[step], c = p[2 * step], d = p[3 * step];
     struct complex s0, s1, d0, d1;
     s0.re = a.re + c.re;
@@ -57,7 +59,7 @@ static void transform(void) {
         int turn = N / (4 * step);
         for (group = 0; group < N; group += 4 * step)
             for (k = 0; k < step; k++) {
-                struct complex *p = data + group + k;
+                struct complex* p = data + group + k;
                 butterfly(p, step);
                 p[step] = mul(p[step], twiddle[k * turn % N]);
                 p[2 * step] = mul(p[2 * step], twiddle[2 * k * turn % N]);

@@ -7,7 +7,7 @@ static int signal[N], work[N], copy[N];
 
 static int mirror(int i, int n) { return i < 0 ? -i : i >= n ? 2 * n - 2 - i : i; }
 
-static void split(int *x, int n) {
+static void split(int* x, int n) {
     int i;
     for (i = 1; i < n; i += 2) x[i] -= (x[i - 1] + x[mirror(i + 1, n)]) >> 1;
     for (i = 0; i < n; i += 2) x[i] += (x[mirror(i - 1, n)] + x[mirror(i + 1, n)] + 2) >> 2;
@@ -18,7 +18,7 @@ static void split(int *x, int n) {
     for (i = 0; i < n; i++) x[i] = work[i];
 }
 
-static void join(int *x, int n) {
+static void join(int* x, int n) {
     int i;
     for (i = 0; i < n / 2; i++) {
         work[2 * i] = x[i];
@@ -29,7 +29,7 @@ static void join(int *x, int n) {
     for (i = 1; i < n; i += 2) x[i] += (x[i - 1] + x[mirror(i + 1, n)]) >> 1;
 }
 
-static int threshold(int *x, int from, int to, int limit) {
+static int threshold(int* x, int from, int to, int limit) {
     int zeroed = 0;
     while (from < to) {
         if (x[from] > -limit && x[from] < limit && x[from] != 0) {
@@ -41,7 +41,7 @@ static int threshold(int *x, int from, int to, int limit) {
     return zeroed;
 }
 
-static long band_energy(const int *x, int from, int to) {
+static long band_energy(const int* x, int from, int to) {
     long e = 0;
     do e += (long)x[from] * x[from];
     while (++from < to);

@@ -4,7 +4,8 @@
 #define TAPS 16
 #define N 48
 
-static const int taps[TAPS] = {-120, 210, 480, -655, -1311, 2200, 5243, 9830, 9830, 5243, 2200, -1311, -655, 480, 210, -120};
+static const int taps[TAPS] = {-120, 210,  480,  -655,  -1311, 2200, 5243, 9830,
+                               9830, 5243, 2200, -1311, -655,  480,  210,  -120};
 static int input[N], output[N];
 
 static int saturate(long v) {
@@ -22,7 +23,7 @@ static void make_input(void) {
     }
 }
 
-static void fir_direct(const int *x, int *y, int n) {
+static void fir_direct(const int* x, int* y, int n) {
     int i, k;
     for (i = TAPS - 1; i < n; i++) {
         long sum = 1L << 14;
@@ -31,7 +32,7 @@ static void fir_direct(const int *x, int *y, int n) {
     }
 }
 
-static void fir_circular(const int *x, int *y, int n) {
+static void fir_circular(const int* x, int* y, int n) {
     int history[TAPS], at = 0, i, k;
     for (k = 0; k < TAPS; k++) history[k] = 0;
     for (i = 0; i < n; i++) {
@@ -48,15 +49,15 @@ static void fir_circular(const int *x, int *y, int n) {
     }
 }
 
-static int fir_symmetric(const int *newest) {
+static int fir_symmetric(const int* newest) {
     long sum = 1L << 14;
     const int *lo = newest, *hi = newest - (TAPS - 1);
-    const int *h = taps;
+    const int* h = taps;
     while (lo > hi) sum += *h++ * ((long)*lo-- + *hi++);
     return saturate(sum >> 15);
 }
 
-static int decimate(const int *x, int *y, int n, int m) {
+static int decimate(const int* x, int* y, int n, int m) {
     int made = 0, i, k;
     for (i = TAPS - 1; i < n; i += m) {
         long sum = 0;
@@ -66,7 +67,7 @@ static int decimate(const int *x, int *y, int n, int m) {
     return made;
 }
 
-static long interpolate(const int *x, int n, int phases) {
+static long interpolate(const int* x, int n, int phases) {
     long total = 0;
     int i, p, k;
     for (i = TAPS / phases; i < n; i++)

@@ -22,7 +22,7 @@ static unsigned newton_sqrt(unsigned v) {
     return x;
 }
 
-static unsigned long divide(unsigned long n, unsigned d, unsigned *rest) {
+static unsigned long divide(unsigned long n, unsigned d, unsigned* rest) {
     unsigned long q = 0, r = 0;
     int i;
     for (i = 31; i >= 0; i--) {
@@ -66,7 +66,8 @@ static int norm(long v) {
 }
 
 int main(void) {
-    static const unsigned long values[] = {0UL, 1UL, 2UL, 3UL, 4UL, 99UL, 100UL, 65535UL, 65536UL, 1000000UL, 2147483648UL, 4294836225UL, 4294967295UL};
+    static const unsigned long values[] = {0UL,     1UL,     2UL,       3UL,          4UL,          99UL,        100UL,
+                                           65535UL, 65536UL, 1000000UL, 2147483648UL, 4294836225UL, 4294967295UL};
     unsigned i, rest, bad = 0;
     for (i = 0; i < sizeof values / sizeof values[0]; i++) {
         unsigned long q;

@@ -30,13 +30,13 @@ static float compensated(void) {
     return s;
 }
 
-static float horner(const float *c, int n, float x) {
+static float horner(const float* c, int n, float x) {
     float r = c[n];
     while (n-- > 0) r = r * x + c[n];
     return r;
 }
 
-static float powers(const float *c, int n, float x) {
+static float powers(const float* c, int n, float x) {
     float r = 0.0F, p = 1.0F;
     int i;
     for (i = 0; i <= n; i++, p *= x) r += c[i] * p;

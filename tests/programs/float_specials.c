@@ -1,7 +1,10 @@
 // Infinities, not-a-numbers, signed zeros and subnormals of both precisions, through hidden operands.
 #include <zrun.h>
 
-union bits { float f; unsigned long u; };
+union bits {
+    float f;
+    unsigned long u;
+};
 
 static volatile float zero = 0.0F, one = 1.0F, huge = 3.0e38F, tiny = 1.2e-38F;
 
@@ -12,10 +15,11 @@ static unsigned long image(float f) {
 }
 
 static void compare(float a, float b) {
-    put_i16((a < b) | (a <= b) << 1 | (a > b) << 2 | (a >= b) << 3 | (a == b) << 4 | (a != b) << 5 | !(a < b) << 6 | !(a >= b) << 7);
+    put_i16((a < b) | (a <= b) << 1 | (a > b) << 2 | (a >= b) << 3 | (a == b) << 4 | (a != b) << 5 | !(a < b) << 6 |
+            !(a >= b) << 7);
 }
 
-static const char *kind(float f) {
+static const char* kind(float f) {
     if (f != f) return "nan";
     if (f - f != f - f) return f > 0.0F ? "inf" : "-inf";
     if (f == 0.0F) return image(f) >> 31 ? "-0" : "0";

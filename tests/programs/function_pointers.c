@@ -2,7 +2,7 @@
 #include <zrun.h>
 
 typedef int (*binary)(int, int);
-typedef long (*fold)(long, int, void *);
+typedef long (*fold)(long, int, void*);
 
 static int add(int a, int b) { return a + b; }
 static int subtract(int a, int b) { return a - b; }
@@ -22,18 +22,21 @@ static binary choose(char op) {
 
 static int apply(binary f, int a, int b) { return f ? f(a, b) : -1; }
 
-static binary compose_choice(binary (*chooser)(char), const char *ops, int at) { return chooser(ops[at]); }
+static binary compose_choice(binary (*chooser)(char), const char* ops, int at) { return chooser(ops[at]); }
 
-struct weights { int w[4]; int used; };
+struct weights {
+    int w[4];
+    int used;
+};
 
-static long weighted(long so_far, int v, void *context) {
-    struct weights *w = (struct weights *)context;
+static long weighted(long so_far, int v, void* context) {
+    struct weights* w = (struct weights*)context;
     return so_far + (long)v * w->w[w->used++ & 3];
 }
 
-static long polynomial(long so_far, int v, void *context) { return so_far * *(long *)context % 30011L + v; }
+static long polynomial(long so_far, int v, void* context) { return so_far * *(long*)context % 30011L + v; }
 
-static long reduce(const int *a, int n, fold f, void *context) {
+static long reduce(const int* a, int n, fold f, void* context) {
     long r = 0;
     int i;
     for (i = 0; i < n; i++) r = f(r, a[i], context);
@@ -41,22 +44,22 @@ static long reduce(const int *a, int n, fold f, void *context) {
 }
 
 struct shape {
-    const struct operations *ops;
+    const struct operations* ops;
     int a, b;
 };
 
 struct operations {
-    long (*area)(const struct shape *);
-    void (*scale)(struct shape *, int);
+    long (*area)(const struct shape*);
+    void (*scale)(struct shape*, int);
 };
 
-static long rectangle_area(const struct shape *s) { return (long)s->a * s->b; }
-static long triangle_area(const struct shape *s) { return (long)s->a * s->b / 2; }
-static void scale_both(struct shape *s, int k) {
+static long rectangle_area(const struct shape* s) { return (long)s->a * s->b; }
+static long triangle_area(const struct shape* s) { return (long)s->a * s->b / 2; }
+static void scale_both(struct shape* s, int k) {
     s->a *= k;
     s->b *= k;
 }
-static void scale_height(struct shape *s, int k) { s->b *= k; }
+static void scale_height(struct shape* s, int k) { s->b *= k; }
 
 static const struct operations rectangle = {rectangle_area, scale_both}, triangle = {triangle_area, scale_height};
 

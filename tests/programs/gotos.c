@@ -14,7 +14,7 @@ middle:
     return steps;
 }
 
-static int find_pair(const int m[4][4], int key, int *r, int *c) {
+static int find_pair(const int m[4][4], int key, int* r, int* c) {
     int i, j;
     for (i = 0; i < 4; i++)
         for (j = 0; j < 4; j++)
@@ -44,9 +44,7 @@ static int into_block(int n) {
         r += 1;
         if (n > 8) goto two;
         break;
-    case 1:
-        do {
-            r *= 2;
+    case 1: do { r *= 2;
         case 3: r += 3;
         } while (r < 40);
         break;
@@ -90,7 +88,7 @@ none:
     return held - 1;
 }
 
-static int automaton(const char *s) {
+static int automaton(const char* s) {
     int n = 0;
 a:
     if (!*s) return n;

@@ -64,17 +64,22 @@ static int drop(int key) {
     return 1;
 }
 
-struct word { const char *start; int length, count; struct word *next; };
+struct word {
+    const char* start;
+    int length, count;
+    struct word* next;
+};
 static struct word words[16], *chains[5];
 static int word_count;
 
-static void count_word(const char *s, int n) {
+static void count_word(const char* s, int n) {
     unsigned h = 5381;
-    struct word *w;
+    struct word* w;
     int i;
     for (i = 0; i < n; i++) h = h * 33u + (unsigned)s[i];
     for (w = chains[h % 5u]; w; w = w->next) {
-        for (i = 0; i < n && w->length == n && w->start[i] == s[i]; i++) {}
+        for (i = 0; i < n && w->length == n && w->start[i] == s[i]; i++) {
+        }
         if (i == n && w->length == n) {
             w->count++;
             return;
@@ -108,7 +113,8 @@ int main(void) {
     put_i16(live);
     put_i16(probes);
     while (*p) {
-        for (q = p; *q && *q != ' '; q++) {}
+        for (q = p; *q && *q != ' '; q++) {
+        }
         count_word(p, (int)(q - p));
         p = *q ? q + 1 : q;
     }

@@ -13,7 +13,7 @@ static int smaller(long a, long b) { return a < b; }
 static int larger(long a, long b) { return a > b; }
 static int by_low_digit(long a, long b) { return a % 10 < b % 10 || (a % 10 == b % 10 && a < b); }
 
-static void push(struct heap *h, long v) {
+static void push(struct heap* h, long v) {
     int i = h->count++;
     while (i > 0) {
         int up = (i - 1) / 2;
@@ -24,7 +24,7 @@ static void push(struct heap *h, long v) {
     h->item[i] = v;
 }
 
-static long pop(struct heap *h) {
+static long pop(struct heap* h) {
     long top = h->item[0], v = h->item[--h->count];
     int i = 0, child;
     while ((child = 2 * i + 1) < h->count) {
@@ -38,11 +38,11 @@ static long pop(struct heap *h) {
 }
 
 #define NODES 7
-static const int edge[NODES][NODES] = {
-    {0, 7, 9, 0, 0, 14, 0}, {7, 0, 10, 15, 0, 0, 0}, {9, 10, 0, 11, 0, 2, 0}, {0, 15, 11, 0, 6, 0, 0},
-    {0, 0, 0, 6, 0, 9, 0},  {14, 0, 2, 0, 9, 0, 0},  {0, 0, 0, 0, 0, 0, 0}};
+static const int edge[NODES][NODES] = {{0, 7, 9, 0, 0, 14, 0},  {7, 0, 10, 15, 0, 0, 0}, {9, 10, 0, 11, 0, 2, 0},
+                                       {0, 15, 11, 0, 6, 0, 0}, {0, 0, 0, 6, 0, 9, 0},   {14, 0, 2, 0, 9, 0, 0},
+                                       {0, 0, 0, 0, 0, 0, 0}};
 
-static void distances(int from, int *dist) {
+static void distances(int from, int* dist) {
     struct heap h;
     int i;
     h.count = 0;

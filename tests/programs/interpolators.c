@@ -24,14 +24,14 @@ static int cubic(long position) {
     return (int)(r + in[i]);
 }
 
-static int resample(long step, int (*at)(long), int *out, int room) {
+static int resample(long step, int (*at)(long), int* out, int room) {
     long position;
     int n = 0;
     for (position = 0; position < (long)(N - 1) << 8 && n < room; position += step) out[n++] = at(position);
     return n;
 }
 
-static int shape(const int *x, int n, int bits) {
+static int shape(const int* x, int n, int bits) {
     long error = 0, before = 0;
     int i, ones = 0;
     long quantum = 1L << (16 - bits);
@@ -45,7 +45,7 @@ static int shape(const int *x, int n, int bits) {
     return ones;
 }
 
-static long cic(const int *x, int n, int r) { /* three stages, by r */
+static long cic(const int* x, int n, int r) { /* three stages, by r */
     unsigned long i1 = 0, i2 = 0, i3 = 0, c1 = 0, c2 = 0, c3 = 0, check = 0;
     int k;
     for (k = 0; k < n; k++) {

@@ -3,15 +3,19 @@
 #include <string.h>
 #include <zrun.h>
 
-struct item { int key; long value; struct item *next; };
+struct item {
+    int key;
+    long value;
+    struct item* next;
+};
 
-static int by_key(const void *a, const void *b) { return ((const struct item *)a)->key - ((const struct item *)b)->key; }
+static int by_key(const void* a, const void* b) { return ((const struct item*)a)->key - ((const struct item*)b)->key; }
 
-static struct item *build(int n) {
-    struct item *list = 0;
+static struct item* build(int n) {
+    struct item* list = 0;
     int i;
     for (i = 0; i < n; i++) {
-        struct item *t = (struct item *)malloc(sizeof *t);
+        struct item* t = (struct item*)malloc(sizeof *t);
         t->key = i;
         t->value = (long)i * i;
         t->next = list;
@@ -20,11 +24,11 @@ static struct item *build(int n) {
     return list;
 }
 
-static long total(const struct item *p) { return p ? p->value + total(p->next) : 0; }
+static long total(const struct item* p) { return p ? p->value + total(p->next) : 0; }
 
-static void release(struct item *p) {
+static void release(struct item* p) {
     while (p) {
-        struct item *next = p->next;
+        struct item* next = p->next;
         free(p);
         p = next;
     }
@@ -58,7 +62,7 @@ int main(void) {
     put_i32(labs(-70000L));
     qsort(items, 5, sizeof items[0], by_key);
     for (i = 0; i < 5; i++) put_i32(items[i].value);
-    found = (struct item *)bsearch(&key, items, 5, sizeof items[0], by_key);
+    found = (struct item*)bsearch(&key, items, 5, sizeof items[0], by_key);
     put_i16(found == items + 3);
     key.key = 9;
     put_i16(bsearch(&key, items, 5, sizeof items[0], by_key) == 0);
@@ -66,10 +70,10 @@ int main(void) {
     put_i32(total(found));
     release(found);
     put_i32(total(build(0)));
-    grown = (int *)calloc(4, sizeof(int));
+    grown = (int*)calloc(4, sizeof(int));
     put_i16(grown[0] + grown[3]);
     grown[3] = 8;
-    grown = (int *)realloc(grown, 20 * sizeof(int));
+    grown = (int*)realloc(grown, 20 * sizeof(int));
     put_i16(grown[3]);
     free(grown);
     return 0;

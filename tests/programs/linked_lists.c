@@ -17,8 +17,8 @@ static void make_pool(void) {
     }
 }
 
-static struct node *make(int value, struct node *next) {
-    struct node *n = spare;
+static struct node* make(int value, struct node* next) {
+    struct node* n = spare;
     if (!n) return 0;
     spare = n->next;
     n->value = value;
@@ -27,10 +27,10 @@ static struct node *make(int value, struct node *next) {
     return n;
 }
 
-static struct node *reverse(struct node *list) {
-    struct node *done = 0;
+static struct node* reverse(struct node* list) {
+    struct node* done = 0;
     while (list) {
-        struct node *next = list->next;
+        struct node* next = list->next;
         list->next = done;
         done = list;
         list = next;
@@ -38,10 +38,10 @@ static struct node *reverse(struct node *list) {
     return done;
 }
 
-static struct node *merge(struct node *a, struct node *b) {
+static struct node* merge(struct node* a, struct node* b) {
     struct node head, *tail = &head;
     while (a && b) {
-        struct node **least = a->value <= b->value ? &a : &b;
+        struct node** least = a->value <= b->value ? &a : &b;
         tail->next = *least;
         tail = *least;
         *least = (*least)->next;
@@ -50,7 +50,7 @@ static struct node *merge(struct node *a, struct node *b) {
     return head.next;
 }
 
-static struct node *sort(struct node *list) {
+static struct node* sort(struct node* list) {
     struct node *slow, *fast;
     if (!list || !list->next) return list;
     slow = list;
@@ -60,10 +60,10 @@ static struct node *sort(struct node *list) {
     return merge(sort(list), sort(fast));
 }
 
-static void remove_if(struct node **list, int divisor) {
+static void remove_if(struct node** list, int divisor) {
     while (*list)
         if ((*list)->value % divisor == 0) {
-            struct node *gone = *list;
+            struct node* gone = *list;
             *list = gone->next;
             gone->next = spare;
             spare = gone;
@@ -71,13 +71,13 @@ static void remove_if(struct node **list, int divisor) {
             list = &(*list)->next;
 }
 
-static long digest(const struct node *list) {
+static long digest(const struct node* list) {
     long d = 7;
     for (; list; list = list->next) d = (d * 31 + list->value) % 65521L;
     return d;
 }
 
-static int has_loop(const struct node *list) {
+static int has_loop(const struct node* list) {
     const struct node *slow = list, *fast = list;
     while (fast && fast->next) {
         slow = slow->next;
@@ -102,7 +102,8 @@ int main(void) {
     while (make(99, 0)) n++;
     put_i16(n);
     put_i16(has_loop(list));
-    for (p = list; p->next; p = p->next) {}
+    for (p = list; p->next; p = p->next) {
+    }
     p->next = list->next;
     put_i16(has_loop(list));
     for (i = 0; i < 5; i++) {

@@ -11,14 +11,14 @@ static int noise(void) {
     return (int)((seed >> 20) & 4095UL) - 2048;
 }
 
-static int output_of(const int *w, const int *x) {
+static int output_of(const int* w, const int* x) {
     long sum = 0;
     int k;
     for (k = 0; k < TAPS; k++) sum += (long)w[k] * x[k];
     return (int)(sum >> 14);
 }
 
-static void shift_in(int *x, int v) {
+static void shift_in(int* x, int v) {
     int k;
     for (k = TAPS - 1; k > 0; k--) x[k] = x[k - 1];
     x[0] = v;

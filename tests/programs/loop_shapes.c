@@ -37,7 +37,7 @@ static unsigned unsigned_down(unsigned n) {
     return s ^ i;
 }
 
-static long pointers(const int *p, const int *end) {
+static long pointers(const int* p, const int* end) {
     long s = 0;
     for (; p < end; p += 2) s = s * 5 % 65521L + *p;
     return s;

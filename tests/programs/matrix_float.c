@@ -26,7 +26,7 @@ static void transpose(matrix a) {
 
 static float magnitude(float v) { return v < 0.0F ? -v : v; }
 
-static int solve(matrix a, float *b, float *det) {
+static int solve(matrix a, float* b, float* det) {
     int col, row, k;
     *det = 1.0F;
     for (col = 0; col < N; col++) {

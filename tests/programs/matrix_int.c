@@ -49,7 +49,7 @@ static int equal(void) {
     return 1;
 }
 
-static void transpose_flat(int *m, int rows, int columns) { /* in place, by cycles */
+static void transpose_flat(int* m, int rows, int columns) { /* in place, by cycles */
     int start, size = rows * columns;
     for (start = 1; start < size - 1; start++) {
         int at = start, count = 0, kept;
@@ -76,7 +76,7 @@ static long diagonal(int offset) {
     return s;
 }
 
-static int saddle(int *row, int *column) {
+static int saddle(int* row, int* column) {
     int i, j, k;
     for (i = 0; i < M; i++)
         for (j = 0; j < K; j++) {

@@ -7,7 +7,7 @@
 static int wave[N];
 static unsigned bins[BINS];
 
-static int find_peaks(const int *x, int n, int rise, int *where, int room) {
+static int find_peaks(const int* x, int n, int rise, int* where, int room) {
     int found = 0, low = x[0], high = x[0], at = 0, up = 1, i;
     for (i = 1; i < n; i++) {
         if (up) {
@@ -31,7 +31,7 @@ static int find_peaks(const int *x, int n, int rise, int *where, int room) {
     return found;
 }
 
-static long running_max(const int *x, int n, int width) {
+static long running_max(const int* x, int n, int width) {
     int queue[16], head = 0, count = 0, i;
     long sum = 0;
     for (i = 0; i < n; i++) {

@@ -9,7 +9,7 @@ struct pid {
     unsigned direction : 2;
 };
 
-static int control(struct pid *c, int error) {
+static int control(struct pid* c, int error) {
     long p = (long)c->kp * error;
     long d = (long)c->kd * (error - c->last);
     long out;
@@ -30,7 +30,7 @@ static int control(struct pid *c, int error) {
     return (int)out;
 }
 
-static void run_plant(struct pid *c, int target, int steps, int every) {
+static void run_plant(struct pid* c, int target, int steps, int every) {
     long speed = 0;
     int i, u = 0;
     for (i = 0; i < steps; i++) {
@@ -45,8 +45,12 @@ static void run_plant(struct pid *c, int target, int steps, int every) {
     put_i16(c->direction);
 }
 
-struct ab { int alpha, beta; };
-struct dq { int d, q; };
+struct ab {
+    int alpha, beta;
+};
+struct dq {
+    int d, q;
+};
 
 static struct ab clarke(int a, int b, int c) {
     struct ab r;
@@ -71,7 +75,8 @@ static struct ab unpark(struct dq v, int sine, int cosine) {
 
 int main(void) {
     struct pid c = {600, 40, 100, 0, 900, 0, 0, 0};
-    static const int sines[6][2] = {{0, 32767}, {16384, 28378}, {28378, 16384}, {32767, 0}, {28378, -16384}, {-16384, -28378}};
+    static const int sines[6][2] = {{0, 32767}, {16384, 28378},  {28378, 16384},
+                                    {32767, 0}, {28378, -16384}, {-16384, -28378}};
     int i;
     run_plant(&c, 500, 60, 12);
     run_plant(&c, -300, 30, 10);

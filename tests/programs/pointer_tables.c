@@ -1,29 +1,38 @@
 // Pointers to pointers, arrays of arrays by pointers, structures in structures, offsets in both directions.
 #include <zrun.h>
 
-struct channel { int gain, history[4]; struct { long low, high; } range; };
-struct unit { struct channel channels[3]; struct channel *active; int count; };
+struct channel {
+    int gain, history[4];
+    struct {
+        long low, high;
+    } range;
+};
+struct unit {
+    struct channel channels[3];
+    struct channel* active;
+    int count;
+};
 
 static int rows[3][5] = {{1, 2, 3, 4, 5}, {10, 20, 30, 40, 50}, {-1, -2, -3, -4, -5}};
-static int *const lines[4] = {rows[0], rows[2], rows[1] + 1, &rows[0][4]};
+static int* const lines[4] = {rows[0], rows[2], rows[1] + 1, &rows[0][4]};
 static struct unit device;
 
-static int pick(int *const *table, int i, int j) { return table[i][j]; }
+static int pick(int* const* table, int i, int j) { return table[i][j]; }
 
 static long over(int (*m)[5], int n) {
     long s = 0;
-    int (*end)[5] = m + n;
+    int(*end)[5] = m + n;
     for (; m < end; m++) {
-        int *p;
+        int* p;
         for (p = *m + 4; p >= *m; p--) s = s * 2 + *p;
     }
     return s;
 }
 
-static void advance(int **p, int by) { *p += by; }
+static void advance(int** p, int by) { *p += by; }
 
-static int feed(struct unit *u, int x) {
-    struct channel *c = u->active;
+static int feed(struct unit* u, int x) {
+    struct channel* c = u->active;
     int i, y = 0;
     for (i = 3; i > 0; i--) c->history[i] = c->history[i - 1];
     c->history[0] = x;
@@ -35,21 +44,21 @@ static int feed(struct unit *u, int x) {
     return y;
 }
 
-static struct channel *widest(struct unit *u) {
+static struct channel* widest(struct unit* u) {
     struct channel *best = u->channels, *c;
     for (c = best + 1; c <= &u->channels[2]; c++)
         if (c->range.high - c->range.low > best->range.high - best->range.low) best = c;
     return best;
 }
 
-static int *maximum(int *a, int n) {
+static int* maximum(int* a, int n) {
     int *best = a, *p;
     for (p = a; p != a + n; ++p)
         if (*p > *best) best = p;
     return best;
 }
 
-static int window(const int *middle, int radius) {
+static int window(const int* middle, int radius) {
     int i, s = 0;
     for (i = -radius; i <= radius; i++) s += middle[i] * (radius + 1 - (i < 0 ? -i : i));
     return s;

@@ -5,7 +5,7 @@ static unsigned lfsr16(unsigned s) { return s >> 1 ^ (0u - (s & 1u) & 0xB400u); 
 
 static unsigned long galois(unsigned long s) { return s & 1UL ? s >> 1 ^ 0xA3000000UL : s >> 1; }
 
-static unsigned long xorshift(unsigned long *s) {
+static unsigned long xorshift(unsigned long* s) {
     unsigned long x = *s;
     x ^= x << 13;
     x ^= x >> 17;
@@ -47,7 +47,7 @@ static int period(unsigned start) {
     return n;
 }
 
-static void shuffle(int *a, int n, unsigned long *s) {
+static void shuffle(int* a, int n, unsigned long* s) {
     while (n > 1) {
         int k = (int)(xorshift(s) % (unsigned long)n--), t = a[n];
         a[n] = a[k];

@@ -29,14 +29,14 @@ static void hanoi(int n, int from, int to, int via) {
     hanoi(n - 1, via, to, from);
 }
 
-static int chain(int n, int *upper) {
+static int chain(int n, int* upper) {
     int mine = n * n;
     if (n == 0) return *upper;
     *upper += mine & 7;
     return chain(n - 1, &mine) + *upper;
 }
 
-static int permutations(int *a, int k, int n, long *d) {
+static int permutations(int* a, int k, int n, long* d) {
     int i, count = 0;
     if (k == n) {
         *d = (*d * 5 + a[0] * 2 + a[n - 1]) % 30011L;

@@ -9,7 +9,7 @@ struct ring {
     unsigned lost;
 };
 
-static int put(struct ring *r, int v) {
+static int put(struct ring* r, int v) {
     unsigned head = r->head, next = (head + 1u) & (SIZE - 1u);
     if (next == r->tail) {
         r->lost++;
@@ -20,7 +20,7 @@ static int put(struct ring *r, int v) {
     return 1;
 }
 
-static int get(struct ring *r, int *v) {
+static int get(struct ring* r, int* v) {
     unsigned tail = r->tail;
     if (tail == r->head) return 0;
     *v = r->data[tail];
@@ -28,7 +28,7 @@ static int get(struct ring *r, int *v) {
     return 1;
 }
 
-static unsigned used(const struct ring *r) { return (r->head - r->tail) & (SIZE - 1u); }
+static unsigned used(const struct ring* r) { return (r->head - r->tail) & (SIZE - 1u); }
 
 static int delay(int x) {
     static int line[5], *p = line;

@@ -6,7 +6,8 @@ typedef long q31;
 
 static q31 add_sat(q31 a, q31 b) {
     unsigned long s = (unsigned long)a + (unsigned long)b;
-    if (((a ^ b) & 0x80000000UL) == 0 && ((s ^ (unsigned long)a) & 0x80000000UL)) return a < 0 ? -2147483647L - 1 : 2147483647L;
+    if (((a ^ b) & 0x80000000UL) == 0 && ((s ^ (unsigned long)a) & 0x80000000UL))
+        return a < 0 ? -2147483647L - 1 : 2147483647L;
     return (q31)s;
 }
 
@@ -52,7 +53,7 @@ static q15 divide(q15 n, q15 d) { /* 0 <= n <= d, d > 0 */
     return q;
 }
 
-static int headroom(const q15 *v, int n) {
+static int headroom(const q15* v, int n) {
     unsigned all = 0;
     int bits = 0;
     while (n-- > 0) all |= (unsigned)(*v < 0 ? ~*v : *v), v++;
@@ -63,7 +64,7 @@ static int headroom(const q15 *v, int n) {
     return bits;
 }
 
-static q31 energy(const q15 *v, int n) {
+static q31 energy(const q15* v, int n) {
     q31 acc = 0;
     for (; n; n--, v++) acc = add_sat(acc, multiply(*v, *v));
     return acc;

@@ -11,13 +11,13 @@ static int less(int a, int b) {
     return a < b;
 }
 
-static void swap(int *a, int *b) {
+static void swap(int* a, int* b) {
     int t = *a;
     *a = *b;
     *b = t;
 }
 
-static void bubble(int *a, int n) {
+static void bubble(int* a, int n) {
     int changed;
     do {
         int i;
@@ -31,7 +31,7 @@ static void bubble(int *a, int n) {
     } while (changed);
 }
 
-static void insertion(int *a, int n) {
+static void insertion(int* a, int n) {
     int i, j;
     for (i = 1; i < n; i++) {
         int v = a[i];
@@ -40,7 +40,7 @@ static void insertion(int *a, int n) {
     }
 }
 
-static void selection(int *a, int n) {
+static void selection(int* a, int n) {
     int i, j;
     for (i = 0; i < n - 1; i++) {
         int m = i;
@@ -50,14 +50,14 @@ static void selection(int *a, int n) {
     }
 }
 
-static void shell(int *a, int n) {
+static void shell(int* a, int n) {
     int gap, i, j;
     for (gap = n / 2; gap > 0; gap /= 2)
         for (i = gap; i < n; i++)
             for (j = i - gap; j >= 0 && less(a[j + gap], a[j]); j -= gap) swap(&a[j], &a[j + gap]);
 }
 
-static void quick(int *a, int n) {
+static void quick(int* a, int n) {
     while (n > 1) {
         int pivot = a[(n - 1) / 2], i = -1, j = n;
         for (;;) {
@@ -79,7 +79,7 @@ static void quick(int *a, int n) {
     }
 }
 
-static void merge(int *a, int n) {
+static void merge(int* a, int n) {
     int half = n >> 1, i = 0, j = half, k = 0;
     if (n < 2) return;
     merge(a, half);
@@ -89,7 +89,7 @@ static void merge(int *a, int n) {
     while (k--) a[k] = k < j ? temp[k] : a[k];
 }
 
-static void radix(int *a, int n) {
+static void radix(int* a, int n) {
     int shift, i;
     for (shift = 0; shift < 16; shift += 4) {
         int count[17] = {0};
@@ -100,7 +100,7 @@ static void radix(int *a, int n) {
     }
 }
 
-static long digest(const int *a) {
+static long digest(const int* a) {
     unsigned long d = 1;
     int i;
     for (i = 0; i < N; i++) d = d * 33UL + (unsigned long)(long)a[i];
@@ -108,7 +108,7 @@ static long digest(const int *a) {
 }
 
 int main(void) {
-    static void (*const sorts[])(int *, int) = {bubble, insertion, selection, shell, quick, merge, radix};
+    static void (*const sorts[])(int*, int) = {bubble, insertion, selection, shell, quick, merge, radix};
     unsigned s;
     int i;
     for (i = 0; i < N; i++) data[i] = (int)((i * 12345L) % 20011L) - 10000;

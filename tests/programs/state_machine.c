@@ -12,12 +12,12 @@ struct receiver {
 
 static int good, bad, timeouts;
 
-static void fail(struct receiver *r) {
+static void fail(struct receiver* r) {
     bad++;
     r->state = IDLE;
 }
 
-static void receive(struct receiver *r, int byte) {
+static void receive(struct receiver* r, int byte) {
     r->silence = 0;
     switch (r->state) {
     case IDLE:
@@ -63,7 +63,7 @@ static void receive(struct receiver *r, int byte) {
     }
 }
 
-static void tick(struct receiver *r) {
+static void tick(struct receiver* r) {
     if (r->state != IDLE && ++r->silence > 2) {
         timeouts++;
         r->state = IDLE;
@@ -71,9 +71,10 @@ static void tick(struct receiver *r) {
 }
 
 /* A sign, digits, a point, digits: -1 stops; 0 start, 1 sign, 2 whole, 3 point, 4 part. */
-static const signed char transitions[5][4] = {{1, 2, 3, -1}, {-1, 2, 3, -1}, {-1, 2, 3, -1}, {-1, 4, -1, -1}, {-1, 4, -1, -1}};
+static const signed char transitions[5][4] = {
+    {1, 2, 3, -1}, {-1, 2, 3, -1}, {-1, 2, 3, -1}, {-1, 4, -1, -1}, {-1, 4, -1, -1}};
 
-static int is_number(const char *s) {
+static int is_number(const char* s) {
     int state = 0;
     for (; *s; s++) {
         int kind = *s == '-' || *s == '+' ? 0 : *s >= '0' && *s <= '9' ? 1 : *s == '.' ? 2 : 3;
@@ -84,14 +85,17 @@ static int is_number(const char *s) {
 }
 
 int main(void) {
-    static const int line[] = {1, START, 2, 10, 20, 30, START, 3, ESCAPE, 0x5E, 5, 6, (0x7E + 11) & 255, START, 9, START,
-                               4, 1, 2, START, 1, 7, 8, -1, -1, START, 2, -1, -1, -1, -1, 5, START, 1, 0, 0, STOP};
-    static const char *const texts[] = {"12", "-3.5", ".", "+.5", "1.", "", "7x", "--1", "1.2.3", "007"};
+    static const int line[] = {1,     START, 2,     10, 20, 30, START, 3, ESCAPE, 0x5E, 5,   6,  (0x7E + 11) & 255,
+                               START, 9,     START, 4,  1,  2,  START, 1, 7,      8,    -1,  -1, START,
+                               2,     -1,    -1,    -1, -1, 5,  START, 1, 0,      0,    STOP};
+    static const char* const texts[] = {"12", "-3.5", ".", "+.5", "1.", "", "7x", "--1", "1.2.3", "007"};
     struct receiver r = {IDLE, 0, 0, 0, 0, {0}};
     unsigned i;
     for (i = 0; i < sizeof line / sizeof line[0]; i++)
-        if (line[i] < 0) tick(&r);
-        else receive(&r, line[i]);
+        if (line[i] < 0)
+            tick(&r);
+        else
+            receive(&r, line[i]);
     put_i16(good);
     put_i16(bad);
     put_i16(timeouts);

@@ -3,9 +3,14 @@
 
 static int zeroed[5];
 static int partly[6] = {1, 2, 3};
-static const char *names[] = {"zero", "one", "two"};
-static int *inside = &partly[2];
-static struct { int a; long b; float c; const char *d; } record = {-1, 100000L, 0.5F, "record"};
+static const char* names[] = {"zero", "one", "two"};
+static int* inside = &partly[2];
+static struct {
+    int a;
+    long b;
+    float c;
+    const char* d;
+} record = {-1, 100000L, 0.5F, "record"};
 static int matrix[2][3] = {{1}, {4, 5}};
 static long big = 0x7FFFFFFFL;
 static unsigned long ubig = 0xFFFFFFFFUL;
@@ -47,7 +52,7 @@ static int average(int x) {
     return sum >> 2;
 }
 
-static int *slot(int i) {
+static int* slot(int i) {
     static int slots[3] = {7, 8, 9};
     return &slots[i];
 }

@@ -3,29 +3,30 @@
 
 static char buffer[64];
 
-static int length(const char *s) {
-    const char *p = s;
+static int length(const char* s) {
+    const char* p = s;
     while (*p) p++;
     return (int)(p - s);
 }
 
-static char *copy(char *to, const char *from) {
-    char *r = to;
-    while ((*to++ = *from++)) {}
+static char* copy(char* to, const char* from) {
+    char* r = to;
+    while ((*to++ = *from++)) {
+    }
     return r;
 }
 
-static char *append(char *to, const char *from) {
+static char* append(char* to, const char* from) {
     copy(to + length(to), from);
     return to;
 }
 
-static int compare(const char *a, const char *b) {
+static int compare(const char* a, const char* b) {
     while (*a && *a == *b) a++, b++;
     return *a - *b;
 }
 
-static const char *find(const char *text, const char *key) {
+static const char* find(const char* text, const char* key) {
     for (;; text++) {
         int i = 0;
         while (key[i] && text[i] == key[i]) i++;
@@ -34,8 +35,8 @@ static const char *find(const char *text, const char *key) {
     }
 }
 
-static void reverse(char *s) {
-    char *e = s + length(s);
+static void reverse(char* s) {
+    char* e = s + length(s);
     while (s < --e) {
         char t = *s;
         *s++ = *e;
@@ -43,8 +44,8 @@ static void reverse(char *s) {
     }
 }
 
-static char *from_number(long v, unsigned base, char *to) {
-    char *p = to;
+static char* from_number(long v, unsigned base, char* to) {
+    char* p = to;
     unsigned long u = v < 0 && base == 10 ? 0UL - (unsigned long)v : (unsigned long)v;
     do *p++ = "0123456789abcdef"[u % base];
     while (u /= base);
@@ -54,8 +55,8 @@ static char *from_number(long v, unsigned base, char *to) {
     return to;
 }
 
-static long to_number(const char *s, int *used) {
-    const char *start = s;
+static long to_number(const char* s, int* used) {
+    const char* start = s;
     unsigned long v = 0;
     int minus = 0;
     while (*s == ' ') s++;
@@ -65,13 +66,13 @@ static long to_number(const char *s, int *used) {
     return minus ? (long)(0UL - v) : (long)v;
 }
 
-static int matches(const char *p, const char *s) {
+static int matches(const char* p, const char* s) {
     if (!*p) return !*s;
     if (*p == '*') return matches(p + 1, s) || (*s && matches(p, s + 1));
     return *s && (*p == '?' || *p == *s) && matches(p + 1, s + 1);
 }
 
-static int upper_words(char *s) {
+static int upper_words(char* s) {
     int words = 0, inside = 0;
     for (; *s; s++) {
         int letter = *s >= 'a' && *s <= 'z';
@@ -84,7 +85,7 @@ static int upper_words(char *s) {
     return words;
 }
 
-static int split(const char *s, char separator, int *lengths) {
+static int split(const char* s, char separator, int* lengths) {
     int n = 0, l = 0;
     do {
         if (*s == separator || !*s) {
@@ -98,7 +99,7 @@ static int split(const char *s, char separator, int *lengths) {
 
 int main(void) {
     static const long numbers[] = {0L, 7L, -1L, 123456789L, 2147483647L, -2147483647L - 1};
-    static const char *const patterns[] = {"*", "a*c", "a?c", "", "*b*b*", "abc?", "a**c"};
+    static const char* const patterns[] = {"*", "a*c", "a?c", "", "*b*b*", "abc?", "a**c"};
     int i, used, lengths[8];
     put_str(append(append(copy(buffer, "one"), ", "), "two"));
     put_i16(length(buffer));

@@ -1,10 +1,23 @@
 // Structures by value: arguments, results, nested assignment, arrays inside, copies before changes, comparison.
 #include <zrun.h>
 
-struct point { int x, y; };
-struct box { struct point low, high; long weight; };
-struct vector { int n; int v[6]; };
-struct mixed { char tag; float f; long long wide; int tail; };
+struct point {
+    int x, y;
+};
+struct box {
+    struct point low, high;
+    long weight;
+};
+struct vector {
+    int n;
+    int v[6];
+};
+struct mixed {
+    char tag;
+    float f;
+    long long wide;
+    int tail;
+};
 
 static struct point make(int x, int y) {
     struct point p;
@@ -45,9 +58,7 @@ static struct vector drop_first(struct vector v) {
     return r;
 }
 
-static long total(struct vector v) {
-    return v.n == 0 ? 0L : v.v[0] + 10L * total(drop_first(v));
-}
+static long total(struct vector v) { return v.n == 0 ? 0L : v.v[0] + 10L * total(drop_first(v)); }
 
 static struct mixed change(struct mixed m, int how) {
     if (how & 1) m.tag = (char)(m.tag + 1);
@@ -59,7 +70,7 @@ static struct mixed change(struct mixed m, int how) {
 
 static struct point table[4];
 
-static struct point *next(void) {
+static struct point* next(void) {
     static int i;
     return &table[i++ % 4];
 }

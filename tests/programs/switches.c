@@ -75,15 +75,15 @@ static int nest(int a, int b) {
     return r;
 }
 
-static void device(int *to, const int *from, int count) {
+static void device(int* to, const int* from, int count) {
     int n = (count + 3) / 4;
     if (count <= 0) return;
     switch (count % 4) {
     case 0: do { *to++ = *from++;
-    case 3: *to++ = *from++;
-    case 2: *to++ = *from++;
-    case 1: *to++ = *from++;
-            } while (--n > 0);
+        case 3: *to++ = *from++;
+        case 2: *to++ = *from++;
+        case 1: *to++ = *from++;
+        } while (--n > 0);
     }
 }
 
@@ -92,14 +92,14 @@ static int only_default(int v) {
     default: v++;
     }
     switch (v)
-    case 3: v = 30;
-    switch (v + 1) {
-    }
+    case 3:
+        v = 30;
+    switch (v + 1) {}
     return v;
 }
 
 enum color { RED, GREEN = 5, BLUE };
-static const char *name(enum color c) {
+static const char* name(enum color c) {
     switch (c) {
     case RED: return "red";
     case GREEN: return "green";

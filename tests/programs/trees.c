@@ -1,13 +1,16 @@
 // Search trees: insertion, deletion, rotation of a balanced tree, traversals with and without recursion, a trie.
 #include <zrun.h>
 
-struct node { int key, level; struct node *child[2]; };
+struct node {
+    int key, level;
+    struct node* child[2];
+};
 
 static struct node nil = {0, 0, {&nil, &nil}}, pool[64];
 static int made;
 
-static struct node *skew(struct node *t) {
-    struct node *l = t->child[0];
+static struct node* skew(struct node* t) {
+    struct node* l = t->child[0];
     if (t->level && l->level == t->level) {
         t->child[0] = l->child[1];
         l->child[1] = t;
@@ -16,8 +19,8 @@ static struct node *skew(struct node *t) {
     return t;
 }
 
-static struct node *split(struct node *t) {
-    struct node *r = t->child[1];
+static struct node* split(struct node* t) {
+    struct node* r = t->child[1];
     if (t->level && r->child[1]->level == t->level) {
         t->child[1] = r->child[0];
         r->child[0] = t;
@@ -27,7 +30,7 @@ static struct node *split(struct node *t) {
     return t;
 }
 
-static struct node *insert(struct node *t, int key) {
+static struct node* insert(struct node* t, int key) {
     if (t == &nil) {
         t = &pool[made++];
         t->key = key;
@@ -40,7 +43,7 @@ static struct node *insert(struct node *t, int key) {
     return split(skew(t));
 }
 
-static int height(const struct node *t) {
+static int height(const struct node* t) {
     int l, r;
     if (t == &nil) return 0;
     l = height(t->child[0]);
@@ -48,8 +51,8 @@ static int height(const struct node *t) {
     return 1 + (l > r ? l : r);
 }
 
-static long in_order(struct node *t) {
-    struct node *stack[16];
+static long in_order(struct node* t) {
+    struct node* stack[16];
     int top = 0;
     long d = 0;
     while (top || t != &nil) {
@@ -65,11 +68,12 @@ static long in_order(struct node *t) {
     return d;
 }
 
-static int ordered(const struct node *t, int low, int high) {
-    return t == &nil || (t->key > low && t->key < high && ordered(t->child[0], low, t->key) && ordered(t->child[1], t->key, high));
+static int ordered(const struct node* t, int low, int high) {
+    return t == &nil ||
+           (t->key > low && t->key < high && ordered(t->child[0], low, t->key) && ordered(t->child[1], t->key, high));
 }
 
-static int find(const struct node *t, int key, int *steps) {
+static int find(const struct node* t, int key, int* steps) {
     for (*steps = 0; t != &nil; t = t->child[key > t->key]) {
         ++*steps;
         if (t->key == key) return 1;
@@ -77,14 +81,17 @@ static int find(const struct node *t, int key, int *steps) {
     return 0;
 }
 
-struct trie { int ends; int next[4]; };
+struct trie {
+    int ends;
+    int next[4];
+};
 static struct trie tries[40];
 static int trie_count = 1;
 
-static int add_word(const char *s) {
+static int add_word(const char* s) {
     int at = 0;
     for (; *s; s++) {
-        int *slot = &tries[at].next[*s - 'a'];
+        int* slot = &tries[at].next[*s - 'a'];
         if (!*slot) *slot = trie_count++;
         at = *slot;
     }
@@ -99,7 +106,7 @@ static int count_prefix(int at) {
 }
 
 int main(void) {
-    struct node *root = &nil;
+    struct node* root = &nil;
     int i, steps;
     for (i = 0; i < 50; i++) root = insert(root, (i * 23) % 61);
     for (i = 0; i < 5; i++) root = insert(root, i * 23);

@@ -1,18 +1,30 @@
 // Unions: images of floats, halves of longs, tagged variants, and structures that share their first members.
 #include <zrun.h>
 
-union number { float f; unsigned long u; long l; };
-union halves { unsigned long whole; struct { unsigned first, second; } part; unsigned words[2]; };
+union number {
+    float f;
+    unsigned long u;
+    long l;
+};
+union halves {
+    unsigned long whole;
+    struct {
+        unsigned first, second;
+    } part;
+    unsigned words[2];
+};
 enum kind { INTEGER, REAL, PAIR, TEXT };
 
-static const char *const texts[] = {"", "abc"};
+static const char* const texts[] = {"", "abc"};
 
 struct variant {
     enum kind kind;
     union {
         long i;
         float r;
-        struct { int a, b; } p;
+        struct {
+            int a, b;
+        } p;
         int t;
     } u;
 };
@@ -39,14 +51,14 @@ static float inverse_root(float x) {
     return y * (1.5F - 0.5F * x * y * y);
 }
 
-static long value(const struct variant *v) {
+static long value(const struct variant* v) {
     switch (v->kind) {
     case INTEGER: return v->u.i;
     case REAL: return (long)(v->u.r * 100.0F);
     case PAIR: return v->u.p.a * 1000L + v->u.p.b;
     case TEXT: {
         long n = 0;
-        const char *s = texts[v->u.t];
+        const char* s = texts[v->u.t];
         while (*s) n = n * 2 + *s++;
         return n;
     }
@@ -54,15 +66,13 @@ static long value(const struct variant *v) {
     return -1;
 }
 
-static void mutate(struct variant *v) {
+static void mutate(struct variant* v) {
     long old = value(v);
     v->kind = (enum kind)((v->kind + 1) % 3);
     switch (v->kind) {
     case INTEGER: v->u.i = old + 1; break;
     case REAL: v->u.r = (float)old / 4.0F; break;
-    default:
-        v->u.p.a = (int)(old / 1000L);
-        v->u.p.b = (int)(old % 1000L);
+    default: v->u.p.a = (int)(old / 1000L); v->u.p.b = (int)(old % 1000L);
     }
 }
 

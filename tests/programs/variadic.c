@@ -23,20 +23,20 @@ static long until_zero(long first, ...) {
     return s;
 }
 
-static void print_all(const char *kinds, va_list ap) {
+static void print_all(const char* kinds, va_list ap) {
     for (; *kinds; kinds++) switch (*kinds) {
         case 'i': put_i16(va_arg(ap, int)); break;
         case 'l': put_i32(va_arg(ap, long)); break;
         case 'u': put_u32(va_arg(ap, unsigned)); break;
         case 'q': put_i64(va_arg(ap, long long)); break;
-        case 's': put_str(va_arg(ap, const char *)); break;
+        case 's': put_str(va_arg(ap, const char*)); break;
         case 'd': put_f64(va_arg(ap, long double)); break;
-        case 'p': put_i16(*va_arg(ap, int *)); break;
+        case 'p': put_i16(*va_arg(ap, int*)); break;
         default: put_str("?");
         }
 }
 
-static void print(const char *kinds, ...) {
+static void print(const char* kinds, ...) {
     va_list ap;
     va_start(ap, kinds);
     print_all(kinds, ap);

@@ -9,19 +9,19 @@ static float xf[N], yf[N];
 static long long xw[N];
 static unsigned char bytes[N];
 
-static void add16(int *restrict z, const int *restrict x, const int *restrict y, int n) {
+static void add16(int* restrict z, const int* restrict x, const int* restrict y, int n) {
     int i;
     for (i = 0; i < n; i++) z[i] = x[i] + y[i];
 }
 
-static long dot16(const int *x, const int *y, int n) {
+static long dot16(const int* x, const int* y, int n) {
     long s = 0;
     int i;
     for (i = 0; i < n; i++) s += (long)x[i] * y[i];
     return s;
 }
 
-static long dot_by_four(const int *x, const int *y) {
+static long dot_by_four(const int* x, const int* y) {
     long s = 0;
     int i;
     for (i = 0; i < N; i += 4) {
@@ -33,12 +33,12 @@ static long dot_by_four(const int *x, const int *y) {
     return s;
 }
 
-static void scale(float *y, const float *x, float k, int n) {
+static void scale(float* y, const float* x, float k, int n) {
     int i;
     for (i = 0; i < n; i++) y[i] = k * x[i] + y[i];
 }
 
-static void extremes(const long *x, int n, long *low, long *high) {
+static void extremes(const long* x, int n, long* low, long* high) {
     int i;
     *low = *high = x[0];
     for (i = 1; i < n; i++) {
@@ -47,44 +47,44 @@ static void extremes(const long *x, int n, long *low, long *high) {
     }
 }
 
-static int count_if(const int *x, int n, int limit) {
+static int count_if(const int* x, int n, int limit) {
     int i, c = 0;
     for (i = 0; i < n; i++) c += x[i] > limit;
     return c;
 }
 
-static void reverse_copy(long *to, const long *from, int n) {
+static void reverse_copy(long* to, const long* from, int n) {
     int i;
     for (i = 0; i < n; i++) to[n - 1 - i] = from[i];
 }
 
-static void smooth(int *x, int n) {
+static void smooth(int* x, int n) {
     int i;
     for (i = 1; i < n; i++) x[i] = (x[i] + x[i - 1]) / 2;
 }
 
-static void shift_down(int *x, int n, int by) {
+static void shift_down(int* x, int n, int by) {
     int i;
     for (i = 0; i + by < n; i++) x[i] = x[i + by];
 }
 
-static void select(int *z, const int *x, const int *y, const unsigned char *mask, int n) {
+static void select(int* z, const int* x, const int* y, const unsigned char* mask, int n) {
     int i;
     for (i = 0; i < n; i++) z[i] = mask[i] ? x[i] : y[i];
 }
 
-static void gather(int *z, const int *x, const unsigned char *where, int n) {
+static void gather(int* z, const int* x, const unsigned char* where, int n) {
     int i;
     for (i = 0; i < n; i++) z[i] = x[where[i]];
 }
 
-static long long prefix(long long *x, int n) {
+static long long prefix(long long* x, int n) {
     int i;
     for (i = 1; i < n; i++) x[i] += x[i - 1];
     return x[n - 1];
 }
 
-static long digest(const int *x) {
+static long digest(const int* x) {
     long d = 0;
     int i;
     for (i = 0; i < N; i++) d = (d * 3 + x[i]) % 1000003L;

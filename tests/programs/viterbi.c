@@ -33,7 +33,7 @@ static void encode(unsigned long bits) {
     }
 }
 
-static int decode(unsigned long *bits) {
+static int decode(unsigned long* bits) {
     int metric[STATES] = {0, 100, 100, 100}, next[STATES];
     int i, s, best = 0, cost;
     for (i = 0; i < LENGTH; i++) {

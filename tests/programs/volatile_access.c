@@ -3,7 +3,11 @@
 
 static volatile int port, status = 3;
 static volatile long counter;
-static struct { volatile unsigned flag : 1, mode : 3; volatile int data[2]; int plain; } device;
+static struct {
+    volatile unsigned flag : 1, mode : 3;
+    volatile int data[2];
+    int plain;
+} device;
 
 static int wait(int limit) {
     int spins = 0;
@@ -37,7 +41,7 @@ static long count_up(int n) {
     return counter;
 }
 
-static int through_pointer(volatile int *p, int n) {
+static int through_pointer(volatile int* p, int n) {
     int sum = 0;
     do {
         *p = *p + n;
@@ -61,7 +65,7 @@ static int local_volatile(int n) {
     return twice + i;
 }
 
-static int conditional(volatile int *p, int use) {
+static int conditional(volatile int* p, int use) {
     int v = use ? *p : -1;
     return use && *p == v;
 }

@@ -34,7 +34,7 @@ static void make(enum shape s) {
         }
         case HANN: window[i] = 0.5F - 0.5F * cos_step(i == 0); break;
         default: window[i] = 0.0F;
-    }
+        }
 }
 
 static float root(float v) {

@@ -37,22 +37,12 @@ struct CALL_SITE {
     std::string name;
 };
 
-// A loop whose number of trips an annotation promises.
-struct LOOP_CHECK {
-    uint64_t min = 0, max = ~uint64_t{0}, factor = 1;
-    uint32_t line = 0;
-    std::vector<uint8_t> inside; // by statement
-    uint32_t head = 0;           // statement
-    bool test_first = false;     // the head is passed once more than the body
-};
-
 struct PROGRAM {
     const IC_UNIT& unit;
     EXEC_OPTIONS options;
     MACHINE m;
     std::deque<FUNCTION> functions; // in file order
     std::deque<XNODE> nodes;
-    std::deque<CALL_SITE> calls;
     std::deque<SWITCH_TABLE> tables;
     std::deque<std::string> texts;
     std::deque<std::vector<uint16_t>> counted;
@@ -167,5 +157,4 @@ private:
     void switch_table();
     void define(uint32_t label) { labels[label] = static_cast<uint32_t>(f->code.size()); }
     void resolve();
-    void annotate();
 };

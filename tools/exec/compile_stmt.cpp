@@ -173,5 +173,4 @@ void COMPILER::function() {
     resolve();
     f->frame = (f->frame + 3) & ~uint64_t{3};
     f->depth = deepest;
-    f->compiled = true;
 }

@@ -64,7 +64,7 @@ inline int64_t from_float(double d) {
     return v;
 }
 
-enum STMT_KIND : uint8_t { S_EXPR, S_BRANCH, S_CBRANCH, S_COUNTED, S_SWITCH, S_RETURN, S_URETURN, S_MARK, S_FAIL };
+enum STMT_KIND : uint8_t { S_EXPR, S_BRANCH, S_CBRANCH, S_SWITCH, S_RETURN, S_URETURN, S_FAIL };
 
 struct SWITCH_TABLE {
     std::vector<std::pair<int64_t, uint32_t>> cases; // by value
@@ -74,7 +74,7 @@ struct SWITCH_TABLE {
 struct STMT {
     STMT_KIND kind = S_EXPR;
     const XNODE* tree = nullptr;
-    uint32_t target = 0; // index of a statement; of S_MARK, a loop
+    uint32_t target = 0; // index of a statement
     uint32_t cost = 1;   // nodes
     uint32_t line = 0;
     uint64_t count = 0; // times executed
@@ -88,20 +88,16 @@ struct PARAMETER {
     int64_t offset;
 };
 
-struct LOOP_CHECK;
-
 struct FUNCTION {
     IC_SYMBOL* sym = nullptr;
     const IC_FUNC* source = nullptr;
     std::string name;
-    bool compiled = false;
     std::vector<STMT> code;
     std::vector<PARAMETER> params;
     SHAPE result;
     uint64_t frame = 0; // units
     size_t depth = 0;   // of its deepest tree
     uint64_t calls = 0;
-    std::vector<LOOP_CHECK> loops;
 };
 
 struct LIBRARY_ENTRY;

@@ -11,7 +11,7 @@ const char help[] =
     "  --max-memory N   16-bit units of memory, 16777216 if not given\n"
     "  --stats          nodes by operator, loads, stores, branches, calls and multiplies, on standard error\n"
     "  --profile        the same by function and line: calls, nodes, executions\n"
-    "  --check          asserted conditions are checked\n"
+    "  --check          asserted conditions are checked; inline assembly ends the run\n"
     "  --globals        a digest of each object's contents at the end\n"
     "  --help           this text\n"
     "The status is main's value modulo 256, or:\n"

@@ -72,12 +72,23 @@ class Faults(unittest.TestCase):
             with self.subTest(fault):
                 done = self.fuzz(fault, "--levels", "0 3")
                 self.assertEqual(done.returncode, 1, done.stdout + done.stderr)
-                self.assertIn(f"FAIL right --opt_level=3", done.stdout)
+                self.assertIn("FAIL right --opt_level=3", done.stdout)
                 self.assertIn(said, done.stdout)
                 self.assertRegex(done.stdout, r"1 programs, 4 runs, 1 differences, 0 skipped\n$")
                 kept = self.folder / "found" / "right"
                 self.assertEqual((kept / "right.c").read_text(), PROGRAM.format(7))
                 self.assertIn("--opt_level=3", (kept / "show.sh").read_text())
+
+    def test_the_reducer_is_told_which_cuts_still_show_the_fault(self):
+        cut, sound = PROGRAM.format(7).replace("return 0;", ""), "int main(void) { return 0; }\n"
+        uninitialized = PROGRAM.format(7).replace("i = 0;", ";")
+        for fault, texts in (("exit 3", {cut: 0, sound: 0, uninitialized: 1, "int": 1}),
+                             ("cp wrong.if $out", {cut: 0, ENDLESS: 1})):
+            self.fuzz(fault.replace("wrong.if", str(self.folder / "wrong.if")), "--levels", "3")
+            for text, status in texts.items():
+                (self.folder / "reduced.c").write_text(text)
+                done = subprocess.run([self.folder / "found" / "right" / "interesting.sh"], cwd=self.folder)
+                self.assertEqual(done.returncode, status, f"{fault}: {text}")
 
     def test_a_sound_optimizer_has_no_differences(self):
         done = self.fuzz("cp $in $out")
@@ -101,8 +112,8 @@ class Generator(unittest.TestCase):
 
     def test_a_few_programs_hold_every_kind_of_statement(self):
         text = "\n".join(Program(seed, 4).text() for seed in range(40))
-        for kind in (r"#pragma MUST_ITERATE\(\d", r"#pragma UNROLL", r"\bdo \{", r"\bswitch \(", r"\bbreak;", r"continue;",
-                     r"\*p\d+\+\+", r"\*--p\d+", r"q\d+->", r"volatile", r" restrict ", r"long double", r"long long",
+        for kind in (r"#pragma MUST_ITERATE\(\d", r"#pragma UNROLL", r"\bdo \{", r"\bswitch \(", r"\bbreak;",
+                     r"continue;", r"\*p\d+\+\+", r"\*--p\d+", r"q\d+->", r"volatile", r" restrict ", r"long double", r"long long",
                      r" : 5;", r" [-+*/%&|^]= ", r" && ", r" \|\| ", r"\? \(\w[^?:]* = ", r"-= \d\) \{", r" % \d",
                      r" / \d", r"<< ", r">> ", r"static const ", r"kernel\d\(g\d+", r"\]\[", r"\*q\d+ = rs"):
             self.assertRegex(text, kind)

@@ -25,6 +25,9 @@ from zbench import Tools, Trouble, difference  # noqa: E402
 
 DIRECTIVE = re.compile(r"^\s*//\s*(RUN|FUNCTION|HAS|NOT|COUNT\s+\d+):\s*(.*?)\s*$")
 
+# A misspelt directive, or one that a formatter moved behind other words, must not pass for a comment.
+MISPLACED = re.compile(r"//\s*[A-Z]{3,}( \d+)?:|//.*\b(RUN|FUNCTION|HAS|NOT|COUNT \d+):")
+
 
 @dataclass(frozen=True)
 class Expectation:
@@ -63,8 +66,8 @@ def read_case(text):
     for number, line in enumerate(text.splitlines(), 1):
         found = DIRECTIVE.match(line)
         if not found:
-            if re.match(r"\s*//\s*[A-Z]{3,}( \d+)?:", line):
-                raise Trouble(f"line {number}: unknown directive: {line.strip()}")
+            if MISPLACED.search(line):
+                raise Trouble(f"line {number}: no directive that is known: {line.strip()}")
             continue
         kind, argument = found.groups()
         if not argument:

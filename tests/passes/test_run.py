@@ -49,7 +49,8 @@ CASES = [
 ]
 
 UNSOUND = ["// HAS: x", "// RUN: -o1", "// RUN: -o1\n// RUN: -o2\n// HAS: x", "// RUN: -o1\n// HASNT: x\n// HAS: y",
-           "// RUN: -o1\n// COUNT: x\n// HAS: y", "// RUN: -o1\n// HAS:"]
+           "// RUN: -o1\n// COUNT: x\n// HAS: y", "// RUN: -o1\n// HAS:",
+           "// RUN: -o1\n// NOT: x\n// so that it stays. HAS: y"]
 
 PROGRAM = """#include <zrun.h>
 // RUN: --opt_level=1

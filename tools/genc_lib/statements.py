@@ -15,6 +15,8 @@ class Body(Expressions):
         self.lines, self.indent, self.factor, self.cost = [], 1, 1, 0
         # Whether `break` and `continue` would mean the loop around, and may stand there.
         self.in_loop = self.in_do = self.in_switch = False
+        # Behind the outermost loop, while no loop around promises a count: where `goto` may leave all of them for.
+        self.out, self.labels, self.used_labels = None, 0, []
         self.declarations = []
 
     # Writing.
@@ -31,6 +33,10 @@ class Body(Expressions):
         gap, start = "" if type_name.endswith("*") else " ", "" if first is None else f" = {first}"
         self.declarations.append(f"{type_name}{gap}{name}{start};")
         return name
+
+    def new_label(self):
+        self.labels += 1
+        return f"out{self.labels}"
 
     def block(self, depth, count):
         self.indent += 1
@@ -141,9 +147,12 @@ class Body(Expressions):
         self.put(f"{target.text} = {value.text};")
 
     def leave(self):
-        """An early way out of the loop around."""
+        """An early way out of the loop around, or of all of them."""
         word = "continue" if self.rng.random() < 0.4 and not self.in_do else "break"
-        if self.in_switch:
+        if self.out and len(self.scope.indices) > 1 and self.rng.random() < 0.6:
+            word = f"goto {self.out}"
+            self.used_labels.append(self.out)
+        elif self.in_switch:
             return self.assignment()
         self.put(f"if ({self.condition(1)}) {word};")
 
@@ -204,22 +213,31 @@ class Body(Expressions):
         if not early:
             self.put(*loops.pragmas(self.rng, loop))
         self.put(*loop.opening)
-        kept = self.factor, self.in_loop, self.in_do, self.in_switch
+        kept = self.factor, self.in_loop, self.in_do, self.in_switch, self.out
+        outermost = early and not self.scope.indices
+        if outermost:
+            self.out = self.new_label()
+        elif not early:
+            self.out = None
         self.factor *= max(1, loop.most)
         # Where the count is at the end of the body, a `continue` would pass it by.
         self.in_loop, self.in_do, self.in_switch = early, "do {" in loop.opening, False
         self.scope.indices.append(loop.index)
         write()
         self.scope.indices.pop()
-        self.factor, self.in_loop, self.in_do, self.in_switch = kept
+        left = outermost and self.out in self.used_labels
+        label = self.out
+        self.factor, self.in_loop, self.in_do, self.in_switch, self.out = kept
         self.put(loop.closing)
+        if left:
+            self.put(f"{label}:;")
 
     def loop(self, depth):
         """A loop, or a nest of two or three, each body a few statements."""
         rng, loop = self.rng, self.new_loop()
         if loop is None:
             return self.assignment()
-        early = rng.random() < 0.2
+        early = rng.random() < (0.6 if self.out else 0.2)
         nest = rng.random() < 0.5
 
         def write():
@@ -229,6 +247,10 @@ class Body(Expressions):
                 self.indent -= 1
             if not nest or rng.random() < 0.4:
                 self.block(depth - 1, rng.randint(1, 3))
+            if early and rng.random() < 0.7:
+                self.indent += 1
+                self.leave()
+                self.indent -= 1
 
         self.inside(loop, write, early)
         if rng.random() < 0.15 and not early:

@@ -11,13 +11,15 @@ const char help[] =
     "  --max-memory N   16-bit units of memory, 16777216 if not given\n"
     "  --stats          nodes by operator, loads, stores, branches, calls and multiplies, on standard error\n"
     "  --profile        the same by function and line: calls, nodes, executions\n"
-    "  --check          asserted conditions are checked; inline assembly ends the run\n"
+    "  --check          asserted conditions and promised trip counts of loops are checked; inline assembly\n"
+    "                   ends the run\n"
     "  --globals        a digest of each object's contents at the end\n"
     "  --help           this text\n"
     "The status is main's value modulo 256, or:\n"
     "  64 command line      65 no I-file            66 cannot be executed   67 function or object missing\n"
     "  68 bad address       69 unaligned object     70 division by zero     71 too many steps\n"
     "  72 stack overflow    73 abort() called       74 unreachable place    75 an annotation is wrong\n"
+    "  76 a loop does not iterate as promised\n"
     "with a message on standard error that names the function and the line.\n";
 
 int fail(int status, const std::string& text) {

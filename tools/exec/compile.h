@@ -104,6 +104,8 @@ private:
     size_t depth = 0, deepest = 0;
     std::vector<std::pair<uint32_t, const IC_NODE*>> jumps; // statement, label
     std::unordered_map<uint32_t, uint32_t> labels;          // number to statement
+    std::vector<TRIP_PROMISE> promised;                     // of the loop whose head comes next
+    std::string keyword;                                    // and its keyword in the source
 
     // compile_expr.cpp
     const XNODE* build(const IC_NODE* n);
@@ -155,6 +157,7 @@ private:
     void statement(const IC_NODE* n, uint32_t line);
     STMT& add(STMT_KIND kind, uint32_t line);
     void switch_table();
-    void define(uint32_t label) { labels[label] = static_cast<uint32_t>(f->code.size()); }
+    void define(uint32_t label);
+    void promise(const IC_ITEM& item);
     void resolve();
 };

@@ -13,7 +13,7 @@ int64_t call_direct(const XNODE* x, MACHINE& m) {
     auto* values = static_cast<int64_t*>(alloca((site.args.size() + 1) * sizeof(int64_t)));
     evaluate(site, m, values);
     m.counts.calls++;
-    return m.invoke(*site.target, values);
+    return m.invoke(*site.target, values, site.shapes.data(), site.shapes.size());
 }
 
 int64_t call_library(const XNODE* x, MACHINE& m) {

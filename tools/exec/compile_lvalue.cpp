@@ -32,10 +32,8 @@ int64_t compound_eval(const XNODE* x, MACHINE& m) {
 } // namespace
 
 int64_t COMPILER::slot(uint64_t units) {
-    f->frame = (f->frame + 3) & ~uint64_t{3};
-    const int64_t at = static_cast<int64_t>(f->frame);
-    f->frame += units;
-    return at;
+    f->frame = (f->frame + units + 3) & ~uint64_t{3};
+    return -static_cast<int64_t>(f->frame);
 }
 
 LVALUE COMPILER::through(const XNODE* address, const SHAPE& shape) {

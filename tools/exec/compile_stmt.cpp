@@ -1,5 +1,6 @@
 // Functions: the frame, the statements, labels and switches.
 #include "tools/exec/compile.h"
+#include "tools/exec/trips.h"
 
 #include <algorithm>
 #include <cctype>
@@ -16,8 +17,9 @@ bool is_comment(const char* text) {
 int64_t count_down(const XNODE* x, MACHINE& m) { return run(x->a, m) == 0; }
 } // namespace
 
-// Parameters and locals, each at a multiple of its alignment. Statics and declarations of objects elsewhere have their
-// places among the unit's objects.
+// Parameters and locals, each at a multiple of its alignment below the frame pointer. Statics and declarations of
+// objects elsewhere have their places among the unit's objects. The last named parameter of a variadic function is at
+// the frame pointer, and the arguments that have no name lie behind it.
 void COMPILER::lay_out_frame() {
     size_t parameter = 0;
     for (IC_SYMBOL* s : f->source->locals) {
@@ -25,10 +27,15 @@ void COMPILER::lay_out_frame() {
         const SHAPE shape = shape_of(s->type);
         const uint64_t units = std::max<uint64_t>({shape.units, (s->size + 15) / 16, 1});
         const uint64_t mask = units > 1 ? std::max<uint64_t>(shape.align_mask, 1) : shape.align_mask;
-        f->frame = (f->frame + mask) & ~mask;
-        locals[s] = {B_FRAME, static_cast<int64_t>(f->frame), units};
-        f->frame += units;
-        if (s->level == 1 && parameter < f->params.size()) f->params[parameter++].offset = locals[s].at;
+        const bool is_parameter = s->level == 1 && parameter < f->params.size();
+        if (f->variadic && is_parameter && parameter + 1 == f->params.size()) {
+            locals[s] = {B_FRAME, 0, units};
+            f->params[parameter++].offset = 0;
+            continue;
+        }
+        f->frame = (f->frame + units + mask) & ~mask;
+        locals[s] = {B_FRAME, -static_cast<int64_t>(f->frame), units};
+        if (is_parameter) f->params[parameter++].offset = locals[s].at;
     }
 }
 
@@ -37,6 +44,30 @@ STMT& COMPILER::add(STMT_KIND kind, uint32_t line) {
     f->code.back().kind = kind;
     f->code.back().line = line;
     return f->code.back();
+}
+
+void COMPILER::define(uint32_t label) {
+    labels[label] = static_cast<uint32_t>(f->code.size());
+    for (TRIP_PROMISE& t : promised) {
+        t.head = labels[label];
+        t.tested_last = keyword == "do";
+        t.tested_first = keyword == "for" || keyword == "while";
+        f->promises.push_back(std::move(t));
+    }
+    promised.clear();
+    keyword.clear();
+}
+
+void COMPILER::promise(const IC_ITEM& item) {
+    TRIP_PROMISE t;
+    if (item.kind == IFR_LOOP) {
+        const uint32_t* word = item.facts->word;
+        if (make_promise(word[2], word[3] == UINT32_MAX ? 0 : word[3], word[4], t)) promised.push_back(t);
+    } else if (std::strcmp(item.pragma->name(), "MUST_ITERATE") == 0) {
+        if (read_promise(*item.pragma, t)) promised.push_back(t);
+    } else if (std::strcmp(item.pragma->name(), "SRC_LOOP") == 0 && item.pragma->args.size() > 3) {
+        keyword = item.pragma->args[3];
+    }
 }
 
 void COMPILER::switch_table() {
@@ -160,6 +191,10 @@ void COMPILER::function() {
             if (item.tree) statement(item.tree, line);
             break;
         case IFR_LABEL: define(item.number); break;
+        case IFR_PRAGMA:
+        case IFR_LOOP:
+            if (p.options.check) promise(item);
+            break;
         case IFR_ASM:
             if (p.options.check && !is_comment(item.text)) {
                 STMT& s = add(S_FAIL, line);
@@ -172,6 +207,7 @@ void COMPILER::function() {
     }
     add(S_URETURN, line);
     resolve();
+    find_promised_loops(*f);
     f->frame = (f->frame + 3) & ~uint64_t{3};
     f->depth = deepest;
 }

@@ -24,6 +24,7 @@ enum EXEC_STATUS : int {
     EXEC_ABORT = 73,       // abort() was called
     EXEC_UNREACHABLE = 74, // a place that is declared never to be reached
     EXEC_CHECK = 75,       // an annotation does not hold (--check)
+    EXEC_TRIPS = 76,       // a loop iterates more or less often than promised (--check)
 };
 
 struct EXEC_OPTIONS {

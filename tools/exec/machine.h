@@ -88,6 +88,14 @@ struct PARAMETER {
     int64_t offset;
 };
 
+// How often a loop iterates, by its annotation.
+struct TRIP_PROMISE {
+    uint32_t head = 0; // index of a statement
+    uint64_t min = 0, max = 0, multiple = 1;
+    bool tested_first = false, tested_last = false; // by the keyword of the source, if it is known
+    std::vector<uint8_t> roles;                     // of each statement in the loop
+};
+
 struct FUNCTION {
     IC_SYMBOL* sym = nullptr;
     const IC_FUNC* source = nullptr;
@@ -95,9 +103,11 @@ struct FUNCTION {
     std::vector<STMT> code;
     std::vector<PARAMETER> params;
     SHAPE result;
-    uint64_t frame = 0; // units
+    uint64_t frame = 0; // units, below the frame pointer
     size_t depth = 0;   // of its deepest tree
     uint64_t calls = 0;
+    bool variadic = false;
+    std::vector<TRIP_PROMISE> promises; // of a checked run
 };
 
 struct LIBRARY_ENTRY;
@@ -168,7 +178,8 @@ struct MACHINE {
     }
     int64_t load(const SHAPE& shape, uint64_t address) const; // checked, by shape
     void store(const SHAPE& shape, uint64_t address, int64_t value);
-    int64_t invoke(FUNCTION& f, const int64_t* args);
+    // Arguments in the shapes of the parameters; those beyond, in shapes of their own, go to a variadic function.
+    int64_t invoke(FUNCTION& f, const int64_t* args, const SHAPE* shapes = nullptr, size_t n = 0);
     // A call through an address, with arguments of any shapes.
     int64_t call(int64_t address, const int64_t* args, const SHAPE* shapes, TYPE* const* types, size_t n,
                  const SHAPE& result);

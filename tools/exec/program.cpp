@@ -126,6 +126,7 @@ void PROGRAM::lay_out() {
         f.source = &source;
         f.name = bare(source.sym->name);
         TYPE* t = source.sym->type->real;
+        f.variadic = t->is_func() && t->vararg();
         f.result = t->is_func() ? shape_of(t->return_type()) : int_shape(16, true);
         defined[source.sym->name] = &f;
     }

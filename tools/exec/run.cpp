@@ -1,6 +1,7 @@
 // The run: activations and their statements, from main to the exit status.
 #include "tools/exec/compile.h"
 #include "tools/exec/report.h"
+#include "tools/exec/trips.h"
 
 #include "UTIL/big_stack.h"
 
@@ -17,9 +18,19 @@ uint32_t find_case(const SWITCH_TABLE& table, int64_t v) {
     return it != table.cases.end() && it->first == v ? it->second : table.other;
 }
 
+// Of a function without promises.
+struct NO_WATCH {
+    explicit NO_WATCH(const FUNCTION&) {}
+    void step(uint32_t, uint32_t, MACHINE&) {}
+};
+
+template <class WATCH>
 void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
     STMT* const code = f.code.data();
+    const uint32_t returned = static_cast<uint32_t>(f.code.size());
+    WATCH watch(f);
     for (uint32_t at = 0;;) {
+        const uint32_t from = at;
         STMT& s = code[at];
         here.at = &s;
         s.count++;
@@ -41,11 +52,21 @@ void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
             m.counts.branches++;
             at = find_case(*s.table, run(s.tree, m));
             break;
-        case S_RETURN: m.returned = run(s.tree, m); return;
-        case S_URETURN: return;
+        case S_RETURN: m.returned = run(s.tree, m); return watch.step(from, returned, m);
+        case S_URETURN: return watch.step(from, returned, m);
         default: m.fail(s.status, s.text);
         }
+        watch.step(from, at, m);
     }
+}
+
+uint64_t aligned(uint64_t at, const SHAPE& shape) { return (at + shape.align_mask) & ~uint64_t{shape.align_mask}; }
+
+// Units behind the last named parameter that the arguments beyond take, each at its alignment.
+uint64_t extra_units(const FUNCTION& f, const SHAPE* shapes, size_t n) {
+    uint64_t end = f.params.empty() ? 0 : f.params.back().shape.units;
+    for (size_t i = f.params.size(); i < n; i++) end = aligned(end, shapes[i]) + shapes[i].units;
+    return (end + 3) & ~uint64_t{3};
 }
 } // namespace
 
@@ -60,22 +81,30 @@ void MACHINE::fail(int status, const std::string& text) const {
     throw EXEC_ERROR{status, text + where};
 }
 
-int64_t MACHINE::invoke(FUNCTION& f, const int64_t* args) {
+int64_t MACHINE::invoke(FUNCTION& f, const int64_t* args, const SHAPE* shapes, size_t n) {
     const uintptr_t here_on_host = reinterpret_cast<uintptr_t>(__builtin_frame_address(0));
     if (here_on_host < host_stack_end + f.depth * host_bytes_a_level + host_stack_reserve)
         fail(EXEC_STACK, "stack overflow");
-    if (sp < heap_end + f.frame + 64) fail(EXEC_STACK, "stack overflow");
-    const uint64_t old_fp = fp, old_sp = sp;
-    sp -= f.frame;
-    const uint64_t frame = sp;
+    const uint64_t extra = f.variadic ? extra_units(f, shapes, n) : 0;
+    if (sp < heap_end + f.frame + extra + 64) fail(EXEC_STACK, "stack overflow");
+    const uint64_t old_fp = fp, old_sp = sp, frame = sp - extra;
+    sp = frame - f.frame;
     for (size_t i = 0; i < f.params.size(); i++)
         store(f.params[i].shape, frame + static_cast<uint64_t>(f.params[i].offset), args[i]);
+    if (f.variadic) {
+        uint64_t at = frame + (f.params.empty() ? 0 : f.params.back().shape.units);
+        for (size_t i = f.params.size(); i < n; at += shapes[i++].units)
+            store(shapes[i], at = aligned(at, shapes[i]), args[i]);
+    }
     fp = frame;
     f.calls++;
     ACTIVATION here{&f, nullptr, top};
     top = &here;
     returned = 0;
-    run_statements(f, here, *this);
+    if (f.promises.empty())
+        run_statements<NO_WATCH>(f, here, *this);
+    else
+        run_statements<TRIP_WATCH>(f, here, *this);
     top = here.up;
     fp = old_fp;
     sp = old_sp;
@@ -93,12 +122,13 @@ int64_t MACHINE::call(int64_t address, const int64_t* args, const SHAPE* shapes,
     }
     if (!callee.function) fail(EXEC_MISSING, "the function " + callee.name + " is nowhere defined");
     FUNCTION& f = *callee.function;
-    std::vector<int64_t> converted(f.params.size() + 1);
+    std::vector<int64_t> converted(args, args + n);
+    converted.resize(std::max(n, f.params.size()) + 1);
     for (size_t i = 0; i < f.params.size(); i++)
         converted[i] = i < n                            ? convert_value(args[i], shapes[i], f.params[i].shape)
                        : f.params[i].shape.rep == R_AGG ? static_cast<int64_t>(null_page)
                                                         : 0;
-    return convert_value(invoke(f, converted.data()), f.result, result);
+    return convert_value(invoke(f, converted.data(), shapes, n), f.result, result);
 }
 
 namespace {

@@ -114,7 +114,8 @@ class Generator(unittest.TestCase):
         text = "\n".join(Program(seed, 4).text() for seed in range(40))
         for kind in (r"#pragma MUST_ITERATE\(\d", r"#pragma UNROLL", r"\bdo \{", r"\bswitch \(", r"\bbreak;",
                      r"continue;", r"\*p\d+\+\+", r"\*--p\d+", r"q\d+->", r"volatile", r" restrict ", r"long double",
-                     r"goto out\d", r"long long", r" : 5;", r" [-+*/%&|^]= ", r" && ", r" \|\| ", r"\? \(\w[^?:]* = ",
+                     r"goto out\d", r"\) return [^;]*;\n +\}", r"long long", r" : 5;", r" [-+*/%&|^]= ", r" && ", r" \|\| ",
+                     r"\? \(\w[^?:]* = ",
                      r"-= \d\) \{", r" % \d", r" / \d", r"<< ", r">> ", r"static const ", r"kernel\d\(g\d+", r"\]\[",
                      r"\*q\d+ = rs"):
             self.assertTrue(re.search(kind, text), kind)

@@ -106,7 +106,7 @@ class Kernel:
                       arrays=self.arrays + ([] if self.restricted else rng.sample(shared.arrays, 3)),
                       records=list(shared.records) if rng.random() < 0.5 else [], counts=self.counts,
                       helpers=shared.helpers)
-        body = Body(rng, scope, self.program.kernels, self.restricted)
+        body = Body(rng, scope, self.kind, self.program.kernels, self.restricted)
         for _ in range(size):
             body.statement(3)
         result = body.of_kind(self.kind, 2).text

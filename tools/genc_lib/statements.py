@@ -9,13 +9,13 @@ MOST_RUNS = 600
 
 
 class Body(Expressions):
-    def __init__(self, rng, scope, kernels=(), restricted=False):
+    def __init__(self, rng, scope, returns, kernels=(), restricted=False):
         super().__init__(rng, scope)
-        self.kernels, self.restricted = kernels, restricted
+        self.returns, self.kernels, self.restricted = returns, kernels, restricted
         self.lines, self.indent, self.factor, self.cost = [], 1, 1, 0
         # Whether `break` and `continue` would mean the loop around, and may stand there.
         self.in_loop = self.in_do = self.in_switch = False
-        # Behind the outermost loop, while no loop around promises a count: where `goto` may leave all of them for.
+        # Behind the outermost loop, while no loop around promises a count: where `goto` may lead, and `return` stand.
         self.out, self.labels, self.used_labels = None, 0, []
         self.declarations = []
 
@@ -147,11 +147,13 @@ class Body(Expressions):
         self.put(f"{target.text} = {value.text};")
 
     def leave(self):
-        """An early way out of the loop around, or of all of them."""
+        """An early way out of the loop around, of all of them, or of the function."""
         word = "continue" if self.rng.random() < 0.4 and not self.in_do else "break"
         if self.out and len(self.scope.indices) > 1 and self.rng.random() < 0.6:
             word = f"goto {self.out}"
             self.used_labels.append(self.out)
+        elif self.out and self.rng.random() < 0.25:
+            word = f"return {self.of_kind(self.returns, 1).text}"
         elif self.in_switch:
             return self.assignment()
         self.put(f"if ({self.condition(1)}) {word};")

@@ -195,6 +195,9 @@ class Expressions:
             raise CompileError(where, f"cast to '{type_}'")
         if T.is_void(type_):
             return Node(value.op, T.VOID, value.left, value.right, value.value) if value.op == Op.QUEST else value
+        if trees.bit_width(value) is not None:
+            # A field of its own declared type would pass for converted, and be promoted by its width afterwards.
+            value = operators.promoted(value, where)
         result = trees.convert(value, type_, where)
         if T.is_pointer(value.type) and T.is_integer(type_):
             return constants.fold(result) or result

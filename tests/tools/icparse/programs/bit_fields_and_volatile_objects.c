@@ -1,5 +1,5 @@
 // Bit-fields and volatile objects.
-// Prints: 42251 16 -3 1 1 -448576 1 -3 -2 -3 1 10
+// Prints: 42251 16 -3 1 1 -448576 1 -3 -2 -3 1 10 0 13107
 #include <zrun.h>
 struct R {
     volatile unsigned ctl;
@@ -43,5 +43,8 @@ int main(void) {
     reads();
     ticks;
     put_i16(reads() * 10);
+    // A field narrower than int is an int, until a cast to its declared type makes it unsigned.
+    put_i16((ticks - 3) / R->st.bit.mode);
+    put_u32((ticks - 3) / (unsigned)R->st.bit.mode);
     return 0;
 }

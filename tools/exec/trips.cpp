@@ -107,13 +107,12 @@ uint64_t number(const std::vector<std::string>& words, size_t k) {
 }
 } // namespace
 
-// A loop that iterates a multiple of N times iterates at least N times: whoever relies on the multiple runs N
-// iterations without a test. A promise that contradicts itself is none.
+// A multiple alone leaves room for no iteration. A promise that contradicts itself is none.
 bool make_promise(uint64_t min, uint64_t max, uint64_t multiple, TRIP_PROMISE& promise) {
     promise.max = max ? max : no_limit;
     promise.multiple = std::max<uint64_t>(multiple, 1);
-    promise.min = promise.multiple > 1 ? std::max(min, promise.multiple) : min;
-    return promise.min <= promise.max && (promise.min || promise.max != no_limit);
+    promise.min = min;
+    return min <= promise.max && (min || promise.max != no_limit || promise.multiple > 1);
 }
 
 bool read_promise(const PRAGMA& pragma, TRIP_PROMISE& promise) {
@@ -144,10 +143,9 @@ void TRIP_WATCH::left(const TRIP_PROMISE& p, uint64_t backs, uint32_t from, MACH
     const uint64_t least = backs + (role == LEAVES_BEHIND), most = backs + (role != LEAVES_BEFORE);
     for (uint64_t trips = least; trips <= most; trips++)
         if (trips >= p.min && trips <= p.max && trips % p.multiple == 0) return;
-    std::string text = "a loop iterated " + std::to_string(most) + " times where";
-    if (p.min) text += " at least " + std::to_string(p.min);
-    if (p.max != no_limit) text += std::string(p.min ? " and" : "") + " at most " + std::to_string(p.max);
-    if (p.multiple > 1) text += " by " + std::to_string(p.multiple) + "s";
+    std::string text = "a loop iterated " + std::to_string(most) + " times where at least " + std::to_string(p.min);
+    if (p.max != no_limit) text += " and at most " + std::to_string(p.max);
+    if (p.multiple > 1) text += " in multiples of " + std::to_string(p.multiple);
     m.top->at = &f_m.code[p.head];
     m.fail(EXEC_TRIPS, text + " were promised");
 }

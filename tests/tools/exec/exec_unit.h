@@ -59,6 +59,7 @@ enum : int {
     BRANCH = 114,
     NASSERT = 123,
     MCALL = 132,
+    UMCALL = 133,
 };
 
 class ExecTest : public testing::Test {

@@ -299,89 +299,113 @@ int64_t lib_rand(A& a) {
 double single(double d) { return static_cast<float>(d); }
 
 #define INT(NAME, EXPR)                                                                                                \
-    {NAME, 'i', [](A& a) -> int64_t {                                                                                  \
-         (void)a;                                                                                                      \
-         return EXPR;                                                                                                  \
-     }},
+    {                                                                                                                  \
+        NAME, 'i', [](A& a) -> int64_t {                                                                               \
+            (void)a;                                                                                                   \
+            return EXPR;                                                                                               \
+        }                                                                                                              \
+    }
 #define FLOAT(NAME, EXPR)                                                                                              \
     {NAME, 'f', [](A& a) -> int64_t { return from_float(EXPR); }},                                                     \
-        {NAME "f", 'f', [](A& a) -> int64_t { return from_float(single(EXPR)); }},                                     \
-        {NAME "l", 'f', [](A& a) -> int64_t { return from_float(EXPR); }},
+        {NAME "f", 'f', [](A& a) -> int64_t { return from_float(single(EXPR)); }}, {                                   \
+        NAME "l", 'f', [](A& a) -> int64_t { return from_float(EXPR); }                                                \
+    }
 #define NOTHING(NAME, EXPR)                                                                                            \
-    {NAME, 'v', [](A& a) -> int64_t {                                                                                  \
-         EXPR;                                                                                                         \
-         return 0;                                                                                                     \
-     }},
+    {                                                                                                                  \
+        NAME, 'v', [](A& a) -> int64_t {                                                                               \
+            EXPR;                                                                                                      \
+            return 0;                                                                                                  \
+        }                                                                                                              \
+    }
 const LIBRARY_ENTRY entries[] = {
-    NOTHING("put_i16", put(a, "%d\n", static_cast<int>(static_cast<int16_t>(a.i(0))))) NOTHING(
-        "put_i32", put(a, "%d\n", static_cast<int>(a.i(0)))) NOTHING("put_u32",
-                                                                     put(a, "%u\n", static_cast<unsigned>(a.i(0))))
-        NOTHING("put_i64", put(a, "%lld\n", static_cast<long long>(a.i(0))))
-            NOTHING("put_f32", put(a, "%.9g\n", single(a.f(0)))) NOTHING("put_f64", put(a, "%.17g\n", a.f(0))) NOTHING(
-                "put_str",
-                put(a, "%s\n", text_at(a.m, a.p(0)).c_str())) INT("puts", put(a, "%s\n", text_at(a.m, a.p(0)).c_str()))
-                INT("putchar", std::fputc(static_cast<int>(a.i(0)), a.m.out)) INT("printf", lib_printf(a)) INT(
-                    "sprintf", lib_sprintf(a)) INT("strlen", static_cast<int64_t>(length_at(a.m, a.p(0))))
-                    INT("strcmp", compare_text(a, ~uint64_t{0})) INT("strncmp", compare_text(a, a.p(2))) INT(
-                        "strcpy", copy_text(a, a.p(0))) INT("strcat", copy_text(a, a.p(0) + length_at(a.m, a.p(0))))
-                        INT("strncpy", lib_strncpy(a)) INT("strncat", lib_strncat(a)) INT("strchr", find_char(a, false))
-                            INT("strrchr", find_char(a, true)) INT("strstr", lib_strstr(a)) INT(
-                                "memcpy", (copy_units(a.m, a.p(0), a.p(1), a.p(2)), a.i(0)))
-                                INT("memmove", (copy_units(a.m, a.p(0), a.p(1), a.p(2)), a.i(0))) INT(
-                                    "memset", lib_memset(a)) INT("memcmp", lib_memcmp(a)) INT("memchr", lib_memchr(a))
-                                    INT("atoi", wrap(parse_int(a, false, false), 16, true))
-                                        INT("atol", parse_int(a, false, false)) INT("strtol", parse_int(a, true, false))
-                                            INT("strtoul", parse_int(a, true, true)){
-                                                "atof", 'f', [](A& a) -> int64_t { return parse_float(a, false); }},
+    NOTHING("put_i16", put(a, "%d\n", static_cast<int>(static_cast<int16_t>(a.i(0))))),
+    NOTHING("put_i32", put(a, "%d\n", static_cast<int>(a.i(0)))),
+    NOTHING("put_u32", put(a, "%u\n", static_cast<unsigned>(a.i(0)))),
+    NOTHING("put_i64", put(a, "%lld\n", static_cast<long long>(a.i(0)))),
+    NOTHING("put_f32", put(a, "%.9g\n", single(a.f(0)))),
+    NOTHING("put_f64", put(a, "%.17g\n", a.f(0))),
+    NOTHING("put_str", put(a, "%s\n", text_at(a.m, a.p(0)).c_str())),
+    INT("puts", put(a, "%s\n", text_at(a.m, a.p(0)).c_str())),
+    INT("putchar", std::fputc(static_cast<int>(a.i(0)), a.m.out)),
+    INT("printf", lib_printf(a)),
+    INT("sprintf", lib_sprintf(a)),
+    INT("strlen", static_cast<int64_t>(length_at(a.m, a.p(0)))),
+    INT("strcmp", compare_text(a, ~uint64_t{0})),
+    INT("strncmp", compare_text(a, a.p(2))),
+    INT("strcpy", copy_text(a, a.p(0))),
+    INT("strcat", copy_text(a, a.p(0) + length_at(a.m, a.p(0)))),
+    INT("strncpy", lib_strncpy(a)),
+    INT("strncat", lib_strncat(a)),
+    INT("strchr", find_char(a, false)),
+    INT("strrchr", find_char(a, true)),
+    INT("strstr", lib_strstr(a)),
+    INT("memcpy", (copy_units(a.m, a.p(0), a.p(1), a.p(2)), a.i(0))),
+    INT("memmove", (copy_units(a.m, a.p(0), a.p(1), a.p(2)), a.i(0))),
+    INT("memset", lib_memset(a)),
+    INT("memcmp", lib_memcmp(a)),
+    INT("memchr", lib_memchr(a)),
+    INT("atoi", wrap(parse_int(a, false, false), 16, true)),
+    INT("atol", parse_int(a, false, false)),
+    INT("strtol", parse_int(a, true, false)),
+    INT("strtoul", parse_int(a, true, true)),
+    {"atof", 'f', [](A& a) -> int64_t { return parse_float(a, false); }},
     {"strtod", 'f', [](A& a) -> int64_t { return parse_float(a, true); }},
-    INT("malloc", allocate(a.m, a.p(0))) INT("calloc", lib_calloc(a)) INT("realloc", lib_realloc(a)) NOTHING(
-        "free", release(a.m, a.p(0))) NOTHING("exit", throw EXEC_EXIT{static_cast<int>(a.i(0) & 255)})
-        NOTHING("abort", a.m.fail(EXEC_ABORT, "abort() was called")) INT(
-            "atexit", (a.m.at_exit.push_back(a.i(0)), 0)) INT("abs", wrap(std::abs(wrap(a.i(0), 16, true)), 16, true))
-            INT("labs", wrap(std::abs(wrap(a.i(0), 32, true)), 32, true)) INT(
-                "llabs", a.i(0) < 0 ? static_cast<int64_t>(0 - static_cast<uint64_t>(a.i(0))) : a.i(0))
-                NOTHING("qsort", lib_qsort(a)) INT("bsearch", lib_bsearch(a)) INT("rand", lib_rand(a)) NOTHING(
-                    "srand", a.m.random = static_cast<uint32_t>(a.i(0))) INT("isdigit", a.i(0) >= '0' && a.i(0) <= '9')
-                    INT("isalpha", a.i(0) >= 0 && a.i(0) < 128 && std::isalpha(static_cast<int>(a.i(0))) != 0) INT(
-                        "isalnum", a.i(0) >= 0 && a.i(0) < 128 && std::isalnum(static_cast<int>(a.i(0))) != 0)
-                        INT("isspace", a.i(0) >= 0 && a.i(0) < 128 && std::isspace(static_cast<int>(a.i(0))) != 0) INT(
-                            "isupper", a.i(0) >= 'A' && a.i(0) <= 'Z') INT("islower", a.i(0) >= 'a' && a.i(0) <= 'z')
-                            INT("isxdigit", a.i(0) >= 0 && a.i(0) < 128 &&
-                                                std::isxdigit(static_cast<int>(a.i(0))) !=
-                                                    0) INT("ispunct", a.i(0) >= 0 && a.i(0) < 128 &&
-                                                                          std::ispunct(static_cast<int>(a.i(0))) != 0)
-                                INT("isprint", a.i(0) >= 32 && a.i(0) < 127) INT(
-                                    "iscntrl", (a.i(0) >= 0 && a.i(0) < 32) ||
-                                                   a.i(0) == 127) INT("isgraph", a.i(0) > 32 && a.i(0) < 127)
-                                    INT("toupper", a.i(0) >= 'a' && a.i(0) <= 'z'
-                                                       ? a.i(0) - 32
-                                                       : a.i(0)) INT("tolower", a.i(0) >= 'A' && a.i(0) <= 'Z'
-                                                                                    ? a.i(0) + 32
-                                                                                    : a.i(0))
-                                        FLOAT("sin", std::sin(a.f(0))) FLOAT("cos", std::cos(a.f(0))) FLOAT(
-                                            "tan", std::tan(a.f(0))) FLOAT("asin", std::asin(a.f(0)))
-                                            FLOAT("acos", std::acos(a.f(0))) FLOAT("atan", std::atan(a.f(0))) FLOAT(
-                                                "atan2", std::atan2(a.f(0), a.f(1))) FLOAT("sinh", std::sinh(a.f(0)))
-                                                FLOAT("cosh", std::cosh(a.f(0))) FLOAT("tanh", std::tanh(a.f(0)))
-                                                    FLOAT("exp", std::exp(a.f(0))) FLOAT("log", std::log(a.f(0))) FLOAT(
-                                                        "log10", std::log10(a.f(0))) FLOAT("log2", std::log2(a.f(0)))
-                                                        FLOAT("exp2", std::exp2(a.f(0))) FLOAT(
-                                                            "pow",
-                                                            std::pow(a.f(0), a.f(1))) FLOAT("sqrt", std::sqrt(a.f(0)))
-                                                            FLOAT("fabs", std::fabs(a.f(0))) FLOAT(
-                                                                "floor",
-                                                                std::floor(a.f(0))) FLOAT("ceil", std::ceil(a.f(0)))
-                                                                FLOAT("fmod", std::fmod(a.f(0), a.f(1)))
-                                                                    FLOAT("trunc", std::trunc(a.f(0))) FLOAT(
-                                                                        "round", std::round(a.f(0)))
-                                                                        FLOAT("cbrt", std::cbrt(a.f(0))) FLOAT(
-                                                                            "hypot", std::hypot(a.f(0), a.f(1)))
-                                                                            FLOAT("ldexp",
-                                                                                  std::ldexp(a.f(0),
-                                                                                             static_cast<int>(a.i(1))))
-                                                                                FLOAT("fmin", std::fmin(a.f(0), a.f(1)))
-                                                                                    FLOAT("fmax",
-                                                                                          std::fmax(a.f(0), a.f(1)))};
+    INT("malloc", allocate(a.m, a.p(0))),
+    INT("calloc", lib_calloc(a)),
+    INT("realloc", lib_realloc(a)),
+    NOTHING("free", release(a.m, a.p(0))),
+    NOTHING("exit", throw EXEC_EXIT{static_cast<int>(a.i(0) & 255)}),
+    NOTHING("abort", a.m.fail(EXEC_ABORT, "abort() was called")),
+    INT("atexit", (a.m.at_exit.push_back(a.i(0)), 0)),
+    INT("abs", wrap(std::abs(wrap(a.i(0), 16, true)), 16, true)),
+    INT("labs", wrap(std::abs(wrap(a.i(0), 32, true)), 32, true)),
+    INT("llabs", a.i(0) < 0 ? static_cast<int64_t>(0 - static_cast<uint64_t>(a.i(0))) : a.i(0)),
+    NOTHING("qsort", lib_qsort(a)),
+    INT("bsearch", lib_bsearch(a)),
+    INT("rand", lib_rand(a)),
+    NOTHING("srand", a.m.random = static_cast<uint32_t>(a.i(0))),
+    INT("isdigit", a.i(0) >= '0' && a.i(0) <= '9'),
+    INT("isalpha", a.i(0) >= 0 && a.i(0) < 128 && std::isalpha(static_cast<int>(a.i(0))) != 0),
+    INT("isalnum", a.i(0) >= 0 && a.i(0) < 128 && std::isalnum(static_cast<int>(a.i(0))) != 0),
+    INT("isspace", a.i(0) >= 0 && a.i(0) < 128 && std::isspace(static_cast<int>(a.i(0))) != 0),
+    INT("isupper", a.i(0) >= 'A' && a.i(0) <= 'Z'),
+    INT("islower", a.i(0) >= 'a' && a.i(0) <= 'z'),
+    INT("isxdigit", a.i(0) >= 0 && a.i(0) < 128 && std::isxdigit(static_cast<int>(a.i(0))) != 0),
+    INT("ispunct", a.i(0) >= 0 && a.i(0) < 128 && std::ispunct(static_cast<int>(a.i(0))) != 0),
+    INT("isprint", a.i(0) >= 32 && a.i(0) < 127),
+    INT("iscntrl", (a.i(0) >= 0 && a.i(0) < 32) || a.i(0) == 127),
+    INT("isgraph", a.i(0) > 32 && a.i(0) < 127),
+    INT("toupper", a.i(0) >= 'a' && a.i(0) <= 'z' ? a.i(0) - 32 : a.i(0)),
+    INT("tolower", a.i(0) >= 'A' && a.i(0) <= 'Z' ? a.i(0) + 32 : a.i(0)),
+    FLOAT("sin", std::sin(a.f(0))),
+    FLOAT("cos", std::cos(a.f(0))),
+    FLOAT("tan", std::tan(a.f(0))),
+    FLOAT("asin", std::asin(a.f(0))),
+    FLOAT("acos", std::acos(a.f(0))),
+    FLOAT("atan", std::atan(a.f(0))),
+    FLOAT("atan2", std::atan2(a.f(0), a.f(1))),
+    FLOAT("sinh", std::sinh(a.f(0))),
+    FLOAT("cosh", std::cosh(a.f(0))),
+    FLOAT("tanh", std::tanh(a.f(0))),
+    FLOAT("exp", std::exp(a.f(0))),
+    FLOAT("log", std::log(a.f(0))),
+    FLOAT("log10", std::log10(a.f(0))),
+    FLOAT("log2", std::log2(a.f(0))),
+    FLOAT("exp2", std::exp2(a.f(0))),
+    FLOAT("pow", std::pow(a.f(0), a.f(1))),
+    FLOAT("sqrt", std::sqrt(a.f(0))),
+    FLOAT("fabs", std::fabs(a.f(0))),
+    FLOAT("floor", std::floor(a.f(0))),
+    FLOAT("ceil", std::ceil(a.f(0))),
+    FLOAT("fmod", std::fmod(a.f(0), a.f(1))),
+    FLOAT("trunc", std::trunc(a.f(0))),
+    FLOAT("round", std::round(a.f(0))),
+    FLOAT("cbrt", std::cbrt(a.f(0))),
+    FLOAT("hypot", std::hypot(a.f(0), a.f(1))),
+    FLOAT("ldexp", std::ldexp(a.f(0), static_cast<int>(a.i(1)))),
+    FLOAT("fmin", std::fmin(a.f(0), a.f(1))),
+    FLOAT("fmax", std::fmax(a.f(0), a.f(1))),
+};
 #undef INT
 #undef FLOAT
 #undef NOTHING

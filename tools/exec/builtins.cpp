@@ -109,6 +109,7 @@ void swap_floats(A& a) {
     a.m.store(s, a.p(0), y);
     a.m.store(s, a.p(1), x);
 }
+int64_t whole(double d) { return convert_value(from_float(d), float_shape(64), s64); }
 double single(double d) { return static_cast<float>(d); }
 constexpr double two_pi = 6.283185307179586476925;
 
@@ -176,7 +177,7 @@ const LIBRARY_ENTRY entries[] = {
     INT("__mpyxu", wrap(a.i(0), 16, true) * wrap(a.i(1), 16, false)),
     INT("__mpyb", wrap(a.i(0), 16, true) * wrap(a.i(1), 16, false)),
     INT("__mpy_mov_t", (write(a, 2, s16, a.i(0)), mpy16(a, 0, 1))),
-    INT("__IQ", static_cast<int64_t>(a.f(0) * std::ldexp(1.0, static_cast<int>(a.i(1))))),
+    INT("__IQ", whole(a.f(0) * std::ldexp(1.0, static_cast<int>(a.i(1))))),
     INT("__IQmpy", wrap(a.i(0), 32, true) * wrap(a.i(1), 32, true) >> (a.i(2) & 63)),
     INT("__IQsat", std::max(std::min(a.i(0), a.i(1)), a.i(2))),
     INT("__abs16_sat", std::min<int64_t>(std::abs(wrap(a.i(0), 16, true)), 32767)),
@@ -212,8 +213,8 @@ const LIBRARY_ENTRY entries[] = {
     FLOAT("__sinpuf32", single(std::sin(a.f(0) * two_pi))),
     FLOAT("__cospuf32", single(std::cos(a.f(0) * two_pi))),
     FLOAT("__atanpuf32", single(std::atan(a.f(0)) / two_pi)),
-    INT("__f32toi16r", static_cast<int64_t>(std::clamp(std::nearbyint(a.f(0)), -32768.0, 32767.0))),
-    INT("__f32toui16r", static_cast<int64_t>(std::clamp(std::nearbyint(a.f(0)), 0.0, 65535.0))),
+    INT("__f32toi16r", whole(std::clamp(std::nearbyint(a.f(0)), -32768.0, 32767.0))),
+    INT("__f32toui16r", whole(std::clamp(std::nearbyint(a.f(0)), 0.0, 65535.0))),
     NOTHING("__f32_max_idx", index_of_extreme(a, float_shape(32), true)),
     NOTHING("__f32_min_idx", index_of_extreme(a, float_shape(32), false)),
     NOTHING("__f64_max_idx", index_of_extreme(a, float_shape(64), true)),

@@ -58,7 +58,7 @@ void reset_global_flags() {
 
 void restore_global_flags() {
     if (print_debug)
-        debug_printf("[Restoring options --> -o%d -i%ld --opt_for_speed=%d]\n", opt_level(), auto_inline(), size_speed_goal());
+        debug_printf("[Restoring options --> -o%d -i%d --opt_for_speed=%d]\n", opt_level(), static_cast<int>(auto_inline()), size_speed_goal());
 }
 
 void debug_printf(const char* format, ...) {

@@ -207,4 +207,48 @@ TEST_F(ControlTest, PromisesAreHeldOnlyOnRequest) {
     promised("while", {"4", "4", ""}, 5);
     EXPECT_EQ(run().status, 0);
 }
+
+// A function whose loop calls it again: each activation counts for itself, and each entry from the start. The promise
+// is a loop record.
+TEST_F(ControlTest, PromisesAreOfEachEntryAndActivation) {
+    IC_SYMBOL* f = global("_nest", function_type({pkg.int_t}, pkg.void_t));
+    file->if_write_begin_func(f, &psn);
+    IC_SYMBOL* n = parameter("n", pkg.int_t);
+    file->if_write_end_args(&psn);
+    IC_SYMBOL* i = local("i", pkg.int_t);
+    body();
+    statement(set(i, num(3, pkg.int_t)));
+    file->if_write_loop(1, 0, 3, 3, 0, 0);
+    place(1);
+    unless(name(n), 2);
+    statement(call(f, node(MINUS, pkg.int_t, name(n), num(1, pkg.int_t))));
+    place(2);
+    statement(node(PLUSASG, pkg.int_t, name(i), num(-1, pkg.int_t)));
+    unless(node(EQ, pkg.int_t, name(i), num(0, pkg.int_t)), 1);
+    end();
+    begin(main_sym);
+    body();
+    for (int k = 0; k < 2; k++) statement(call(f, num(2, pkg.int_t)));
+    ret(0);
+    end();
+    EXEC_OPTIONS options;
+    options.check = true;
+    EXPECT_EQ(run(options).status, 0);
+}
+
+TEST_F(ControlTest, LoopRecordsPromise) {
+    begin(main_sym);
+    IC_SYMBOL* i = local("i", pkg.uint_t);
+    body();
+    statement(set(i, num(4, pkg.uint_t)));
+    file->if_write_loop(1, 0, 1, UINT32_MAX, 2, 0);
+    place(1);
+    statement(node(NOTB, pkg.uint_t, name(i)));
+    statement(node(ENDLOOP, pkg.uint_t, name(i), label(1)));
+    ret(0);
+    end();
+    EXEC_OPTIONS options;
+    options.check = true;
+    expect_error(EXEC_TRIPS, "iterated 5 times where at least 1 in multiples of 2", options);
+}
 } // namespace

@@ -133,40 +133,45 @@ TEST_F(ControlTest, AddressOfNoFunctionIsReported) {
 // Arguments beyond the named ones lie behind the last of these, each at its type's alignment; called directly and
 // through an address.
 TEST_F(ControlTest, ArgumentsWithoutNamesLieBehindTheLastNamedOne) {
-    TYPE* type = function_type({pkg.long_t, pkg.int_t}, pkg.void_t, true);
+    TYPE* type = function_type({pkg.int_t, pkg.long_t}, pkg.void_t, true);
     IC_SYMBOL* f = global("_show", type);
     file->if_write_begin_func(f, &psn);
-    IC_SYMBOL *first = parameter("first", pkg.long_t), *last = parameter("last", pkg.int_t);
+    IC_SYMBOL *first = parameter("first", pkg.int_t), *last = parameter("last", pkg.long_t);
     file->if_write_end_args(&psn);
     IC_SYMBOL* own = local("own", pkg.llong_t);
     body();
     statement(set(own, num(-1, pkg.llong_t)));
     auto behind = [&](TYPE* t, int64_t units) {
-        IC_NODE* at = node(PCONV, pkg.mk_ptr(t), node(UAND, pkg.mk_ptr(pkg.int_t), name(last)));
+        IC_NODE* at = node(PCONV, pkg.mk_ptr(t), node(UAND, pkg.mk_ptr(pkg.long_t), name(last)));
         return node(UMULT, t, node(PLUS, pkg.mk_ptr(t), at, num(units, pkg.long_t)));
     };
     put(name(first));
     put(name(last));
-    put(behind(pkg.int_t, 1));
-    put(behind(pkg.long_t, 2));
-    put(behind(pkg.int_t, 4));
-    put(behind(pkg.llong_t, 6));
+    put(behind(pkg.int_t, 2));
+    put(behind(pkg.long_t, 4));
+    put(behind(pkg.int_t, 6));
+    put(behind(pkg.llong_t, 8));
+    put(behind(pkg.int_t, 12));
     put(name(own));
     end();
     begin(main_sym);
     IC_SYMBOL* p = local("p", pkg.mk_ptr(type));
+    local("filler", pkg.long_t); // so that the guard is right above the callee's arguments
+    IC_SYMBOL* guard = local("guard", pkg.llong_t);
     body();
+    statement(set(guard, num(77, pkg.llong_t)));
     auto arguments = [&] {
-        return list({num(100000, pkg.long_t), num(2, pkg.int_t), num(-3, pkg.int_t), num(400000, pkg.long_t),
-                     num(5, pkg.int_t), num(6000000000LL, pkg.llong_t)});
+        return list({num(2, pkg.int_t), num(100000, pkg.long_t), num(-3, pkg.int_t), num(400000, pkg.long_t),
+                     num(5, pkg.int_t), num(6000000000LL, pkg.llong_t), num(7, pkg.int_t)});
     };
     statement(call(f, arguments()));
     statement(set(p, node(UAND, p->type, name(f))));
     statement(node(CALL, pkg.void_t, name(p), arguments()));
+    put(name(guard));
     ret(0);
     end();
-    const std::string once = "100000\n2\n-3\n400000\n5\n6000000000\n-1\n";
-    expect_output(once + once);
+    const std::string once = "2\n100000\n-3\n400000\n5\n6000000000\n7\n-1\n";
+    expect_output(once + once + "77\n");
 }
 
 struct PROMISE_ROW {

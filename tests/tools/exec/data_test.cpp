@@ -108,8 +108,8 @@ TEST_F(ExecTest, StructuresGoByValue) {
 TEST_F(ExecTest, InitialContentsFollowTheLayout) {
     TYPE* row = structure("row", 96,
                           {{"n", pkg.int_t, 0, 0},
-                           {"low", pkg.int_t, 16, 4},
-                           {"high", pkg.uint_t, 20, 12},
+                           {"low", pkg.int_t, 16, 10},
+                           {"high", pkg.uint_t, 26, 6},
                            {"f", pkg.float_t, 32, 0},
                            {"p", pkg.mk_ptr(pkg.int_t), 64, 0}});
     TYPE *rows = pkg.mk_array(row, false, 3, true), *chars = pkg.mk_array(pkg.schar_t, false, 5, true);
@@ -136,11 +136,11 @@ TEST_F(ExecTest, InitialContentsFollowTheLayout) {
     end();
     IC_NODE* skip = node(SKIP, pkg.int_t, num(0, pkg.int_t));
     skip->number = 5;
-    initialize(g, {num(1, pkg.int_t), num(-3, pkg.int_t), num(4095, pkg.uint_t), real("0.25", pkg.float_t),
-                   num(0, pkg.mk_ptr(pkg.int_t)), skip, num(7, pkg.int_t), num(9, pkg.int_t), num(1, pkg.uint_t),
+    initialize(g, {num(1, pkg.int_t), num(-3, pkg.int_t), num(63, pkg.uint_t), real("0.25", pkg.float_t),
+                   num(0, pkg.mk_ptr(pkg.int_t)), skip, num(7, pkg.int_t), num(1017, pkg.int_t), num(1, pkg.uint_t),
                    real("-2.5", pkg.float_t), node(UAND, pkg.mk_ptr(pkg.int_t), name(zero))});
     initialize(word, {text("ab\xFF", 3)});
-    expect_output("1\n-3\n4095\n1\n0\n0\n0\n0\n7\n-7\n1\n-10\n1\n0\n97\n255\n0\n0\n");
+    expect_output("1\n-3\n63\n1\n0\n0\n0\n0\n7\n-7\n1\n-10\n1\n0\n97\n255\n0\n0\n");
 }
 
 TEST_F(ExecTest, ConversionsAtEveryWidth) {

@@ -27,6 +27,12 @@
 
 int output_index = 0;
 
+namespace {
+// Statements without an intrinsic are simplified as they are read, while they are in the cache. The others wait for the end
+// of the function, which decides what their intrinsics are.
+constexpr uint16_t IS_SIMPLIFIED = 1;
+} // namespace
+
 IF_CLIENT* opt_client() {
     static OPT_CLIENT client;
     return &client;
@@ -65,7 +71,9 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
     tree = expr_cleanup(tree);
     if (tree->op == LABELDEF) note_label(static_cast<uint32_t>(tree->lbl->index)); // the head of a counted loop
     LS::initialize_scopes_and_ptrs_from_tree(tree);
-    append(tree, psn);
+    const bool waits = currfuninfo->has_intrinsics || tree->op == LABELDEF;
+    append(waits ? tree : simp_tree(tree, nullptr), psn);
+    if (!waits) currfuninfo->statements->flag1 = IS_SIMPLIFIED;
 }
 
 // What the end of the function has to look up; noted while the tree is at hand.
@@ -253,6 +261,10 @@ void restate_intrinsics(FUNINFO* f) {
 
 void simplify_raw_statements(FUNINFO* f) {
     for (LIST* s = f->statements; s; s = s->rest) {
+        if (s->flag1 == IS_SIMPLIFIED) {
+            s->flag1 = 0;
+            continue;
+        }
         if (f->has_intrinsics)
             s->first = rewrite_tree(s->first, [](NODE* t) { return op_is_intrinsic(t->op) ? fix_BIF_types(t) : t; });
         s->first = simp_tree(s->first, nullptr);

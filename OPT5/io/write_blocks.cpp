@@ -166,6 +166,9 @@ private:
             return false;
         }
         wrexpr(s);
+        // Nothing looks back at a statement that is written, and it is in the cache now.
+        erase_tree(s->first);
+        s->first = nullptr;
         return true;
     }
 

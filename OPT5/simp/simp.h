@@ -22,6 +22,11 @@ NODE* invert_boolean_tree(NODE* tree);             // the logical opposite
 // What remains of a tree whose value isn't used, or null.
 NODE* peel_for_effect(NODE* tree);
 
+// Puts an ICON of `value` and `type` in place of every subtree that is congruent to `target`, effects of which stay in front
+// of it, and simplifies the operators above. What an assignment writes or an address is taken of is left alone. `target` is
+// borrowed and must not be part of `tree`.
+NODE* simp_subst_icon(INT65 value, TYPE* type, const NODE* target, NODE* tree);
+
 // ---- Constants
 // Folds what consists of constants: the value that the target computes, bit for bit. What may trap, is undefined, or
 // cannot be told exactly stays as it is.

@@ -266,4 +266,46 @@ TEST_F(Algebra, EffectsStay) {
     erase_tree(t);
 }
 
+// ---- A known value in place of a tree
+
+TEST_F(Algebra, KnownValuesReplaceTrees) {
+    SYMTAB *xs = symbol("x", tp->int_t), *ys = symbol("y", tp->int_t), *ps = symbol("p", tp->mk_ptr(tp->int_t));
+    auto x = [&] { return name(xs); };
+    auto y = [&] { return name(ys); };
+    NODE* target = x();
+    struct ROW {
+        NODE* tree;
+        const char* expected;
+    } rows[] = {
+        {bin(PLUS, x(), y()), "y + 7"},
+        {bin(MULT, bin(PLUS, x(), icon(1)), y()), "y * 8"},
+        {bin(LT, x(), icon(8)), "1"},
+        {bin(ASG, y(), x(), tp->int_t), "y = 7"},
+        {bin(ASG, x(), bin(PLUS, x(), icon(1)), tp->int_t), "x = 8"}, // the place stays
+        {address(x()), "&x"},
+        {bin(PLUS, y(), icon(1)), "y + 1"},
+    };
+    for (ROW& row : rows) {
+        const std::string before = show(row.tree);
+        row.tree = simp_subst_icon(INT65(7), tp->int_t, target, row.tree);
+        EXPECT_EQ(tree_to_infix(row.tree), row.expected) << before;
+        erase_tree(row.tree);
+    }
+    erase_tree(target);
+
+    // Effects of what is replaced stay.
+    NODE* call_target = call("f", tp->int_t);
+    NODE* t = simp_subst_icon(INT65(3), tp->int_t, call_target, bin(PLUS, call("f", tp->int_t), y()));
+    EXPECT_EQ(count_calls_in_tree(t), 1) << show(t);
+    erase_tree(t);
+    erase_tree(call_target);
+
+    // A pointer found to be a plain number: the compare is of numbers.
+    NODE* pointer = name(ps);
+    t = simp_subst_icon(INT65(-5), tp->long_t, pointer, bin(ULT, name(ps), un(SCONV, y(), tp->long_t), tp->int_t));
+    EXPECT_TRUE(t->op == LT || t->op == GT) << show(t);
+    erase_tree(t);
+    erase_tree(pointer);
+}
+
 } // namespace

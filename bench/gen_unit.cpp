@@ -1,11 +1,11 @@
 // Writes a translation unit of a given size for measurements: gen_unit FUNCTIONS STATEMENTS OUT.if
 //
-// Each function takes an int and a pointer, works on eight int and four long locals with STATEMENTS statements (assignments,
-// loads, stores, multiply-accumulates, forward branches, a counted loop around each sixteen) and returns a long. `main` calls
-// every function and prints a checksum with `put_i32`, so that a unit can be executed before and after. The same arguments
-// give the same bytes. About eleven nodes a statement; the number goes to standard output.
+// Each function takes an int and a pointer, works on eight int and four long locals with STATEMENTS statements
+// (assignments, loads, stores, multiply-accumulates, forward branches, a counted loop around each sixteen) and returns
+// a long. `main` calls every function and prints a checksum with `put_i32`, so that a unit can be executed before and
+// after. The same arguments give the same bytes. About eleven nodes a statement; the number goes to standard output.
 
-#include "tools/model/ic_model.h"
+#include "tools/model/ic_builder.h"
 
 #include <cstdlib>
 #include <vector>
@@ -13,20 +13,35 @@
 namespace {
 
 enum OP {
-    LABEL = 1, NAME = 2, ICON = 4, PLUS = 6, PLUSASG = 7, MINUS = 8, MULT = 11, UMULT = 13, UAND = 16, XORB = 19, RETURN = 36,
-    COMMA = 56, PCOMMA = 57, ASG = 58, CALL = 70, NEQ = 81, LT = 83, SCONV = 104, CBRANCH = 109, BRANCH = 114,
+    LABEL = 1,
+    NAME = 2,
+    ICON = 4,
+    PLUS = 6,
+    PLUSASG = 7,
+    MINUS = 8,
+    MULT = 11,
+    UMULT = 13,
+    UAND = 16,
+    XORB = 19,
+    RETURN = 36,
+    COMMA = 56,
+    PCOMMA = 57,
+    ASG = 58,
+    CALL = 70,
+    NEQ = 81,
+    LT = 83,
+    SCONV = 104,
+    CBRANCH = 109,
+    BRANCH = 114,
 };
 
-class GENERATOR {
+class GENERATOR : IC_BUILDER {
 public:
     GENERATOR(FILE* out, int functions, int statements) : n_functions(functions), n_statements(statements) {
-        TYPE_PKG::init_type_pkg(&pkg);
-        tp = &pkg;
-        file = I_FILE::if_create(out, &pkg, "generated.c");
+        start(out, "generated.c");
     }
 
     bool run() {
-        if_node_table_init();
         TYPE* int_ptr = pkg.mk_ptr(pkg.int_t);
         body_type = function_type({pkg.int_t, int_ptr}, pkg.long_t);
         put_type = function_type({pkg.long_t}, pkg.void_t);
@@ -38,59 +53,12 @@ public:
         IC_SYMBOL* main_sym = global("_main", main_type, 2);
         for (IC_SYMBOL* f : bodies) write_function(f);
         write_main(main_sym, bodies, data);
-        std::printf("%ld nodes\n", nodes);
+        std::printf("%ld nodes\n", node_count);
         return I_FILE::if_close(file, false, false) == 0;
     }
 
 private:
-    // ---- Symbols and types
-    TYPE* function_type(std::vector<TYPE*> params, TYPE* result) {
-        fkPARAM* list = nullptr;
-        for (auto it = params.rbegin(); it != params.rend(); ++it) {
-            auto* p = new fkPARAM;
-            p->type = *it;
-            p->next = list;
-            list = p;
-        }
-        TYPE* t = pkg.mk_func(result, false, false, true, 0, 32, 32);
-        pkg.set_params(t, list);
-        pkg.type_frozen(t);
-        return t;
-    }
-
-    IC_SYMBOL* symbol(const std::string& name, TYPE* type, int sclass) {
-        auto* s = new IC_SYMBOL;
-        s->name = arena.copy(name.c_str());
-        s->type = type;
-        s->size = type->size;
-        s->align = type->align;
-        s->sclass = static_cast<int8_t>(sclass);
-        return s;
-    }
-    IC_SYMBOL* global(const std::string& name, TYPE* type, int sclass) {
-        IC_SYMBOL* s = symbol(name, type, sclass);
-        file->if_enter_global(s);
-        return s;
-    }
-    IC_SYMBOL* local(const std::string& name, TYPE* type, int sclass) {
-        IC_SYMBOL* s = symbol(name, type, sclass);
-        file->if_enter_local(s);
-        file->if_write_symbol(s);
-        file->if_reference_type(type);
-        return s;
-    }
-
     // ---- Trees
-    IC_NODE* node(int op, TYPE* type, IC_NODE* left = nullptr, IC_NODE* right = nullptr) {
-        auto* n = new (arena.take(sizeof(IC_NODE))) IC_NODE(&arena);
-        n->op = op;
-        n->type = type;
-        n->left = left;
-        n->right = right;
-        file->if_reference_type(type);
-        ++nodes;
-        return n;
-    }
     IC_NODE* name(IC_SYMBOL* s) {
         IC_NODE* n = node(NAME, s->type);
         n->sym = s;
@@ -129,13 +97,17 @@ private:
         }
         case 1: {
             IC_SYMBOL* to = y();
-            IC_NODE* product = node(MULT, pkg.long_t, node(SCONV, pkg.long_t, name(x())), node(SCONV, pkg.long_t, name(x())));
+            IC_NODE* product =
+                node(MULT, pkg.long_t, node(SCONV, pkg.long_t, name(x())), node(SCONV, pkg.long_t, name(x())));
             statement(node(PLUSASG, pkg.long_t, name(to), product));
             break;
         }
         case 2: statement(node(ASG, t, element(ptr, random()), node(XORB, t, name(x()), icon(random() & 0xFF)))); break;
         case 3: statement(node(ASG, t, name(x()), node(MINUS, t, element(ptr, random()), name(x())))); break;
-        case 4: statement(node(ASG, t, name(x()), node(XORB, t, node(PLUS, t, name(x()), name(x())), element(ptr, random())))); break;
+        case 4:
+            statement(
+                node(ASG, t, name(x()), node(XORB, t, node(PLUS, t, name(x()), name(x())), element(ptr, random()))));
+            break;
         default: {
             const uint32_t skip = next_label++;
             statement(node(CBRANCH, t, node(LT, t, name(x()), name(x())), label_ref(skip)));
@@ -172,8 +144,10 @@ private:
         for (int i = 0; i < 4; ++i) ys[i] = local("y" + std::to_string(i), pkg.long_t, 1);
         counter = local("i", pkg.int_t, 1);
         file->if_write_end_locals(&psn);
-        statement(node(PCOMMA, pkg.void_t, node(ASG, pkg.int_t, name(a2), name(a)), node(ASG, ptr->type, name(ptr), name(p))));
-        for (int i = 0; i < 8; ++i) statement(node(ASG, pkg.int_t, name(xs[i]), node(PLUS, pkg.int_t, name(a2), icon(i))));
+        statement(node(PCOMMA, pkg.void_t, node(ASG, pkg.int_t, name(a2), name(a)),
+                       node(ASG, ptr->type, name(ptr), name(p))));
+        for (int i = 0; i < 8; ++i)
+            statement(node(ASG, pkg.int_t, name(xs[i]), node(PLUS, pkg.int_t, name(a2), icon(i))));
         for (IC_SYMBOL* s : ys) statement(node(ASG, pkg.long_t, name(s), node(SCONV, pkg.long_t, name(a2))));
         for (int done = 0; done < n_statements; done += 16) loop(std::min(16, n_statements - done));
         IC_NODE* sum = name(ys[0]);
@@ -202,9 +176,6 @@ private:
     }
 
     int n_functions, n_statements;
-    TYPE_PKG pkg;
-    I_FILE* file;
-    IC_ARENA arena;
     TYPE *body_type = nullptr, *put_type = nullptr, *main_type = nullptr;
     IC_SYMBOL *put = nullptr, *ptr = nullptr, *counter = nullptr;
     IC_SYMBOL* xs[8] = {};
@@ -212,7 +183,6 @@ private:
     PSN psn{"generated.c", 1, 1};
     unsigned seed = 1;
     uint32_t next_label = 1;
-    long nodes = 0;
 };
 
 } // namespace

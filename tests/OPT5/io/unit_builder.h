@@ -3,7 +3,7 @@
 
 #include "run.h"
 
-#include "tools/model/ic_model.h"
+#include "tools/model/ic_builder.h"
 
 #include <gtest/gtest.h>
 
@@ -12,69 +12,77 @@
 
 namespace op {
 enum : int {
-    NOP = 0, LABEL = 1, NAME = 2, SCON = 3, ICON = 4, FCON = 5, PLUS = 6, PLUSASG = 7, MINUS = 8, UMINUS = 10, MULT = 11,
-    UMULT = 13, ANDB = 14, UAND = 16, XORB = 19, QUEST = 21, COLON = 22, ANDAND = 23, OROR = 24, LCON = 25, RETURN = 36,
-    SWITCH = 40, DEFAULT = 46, CASE = 47, COMMA = 56, PCOMMA = 57, ASG = 58, COMMAOP = 59, DIV = 60, CALL = 70, UCALL = 72,
-    LOOP = 74, ENDLOOP = 75, EXCLAIM = 76, PLUSPLUS = 78, EQ = 80, NEQ = 81, LT = 83, GT = 85, SCONV = 104, PCONV = 105,
-    PMCONV = 106, CBRANCH = 109, EPVAL = 110, ENDINIT = 112, BRANCH = 114, URETURN = 118, NASSERT = 123, ASSERT = 124,
-    ICALL = 129, MCALL = 132, UMCALL = 133,
+    NOP = 0,
+    LABEL = 1,
+    NAME = 2,
+    SCON = 3,
+    ICON = 4,
+    FCON = 5,
+    PLUS = 6,
+    PLUSASG = 7,
+    MINUS = 8,
+    UMINUS = 10,
+    MULT = 11,
+    UMULT = 13,
+    ANDB = 14,
+    UAND = 16,
+    XORB = 19,
+    QUEST = 21,
+    COLON = 22,
+    ANDAND = 23,
+    OROR = 24,
+    LCON = 25,
+    RETURN = 36,
+    SWITCH = 40,
+    DEFAULT = 46,
+    CASE = 47,
+    COMMA = 56,
+    PCOMMA = 57,
+    ASG = 58,
+    COMMAOP = 59,
+    DIV = 60,
+    CALL = 70,
+    UCALL = 72,
+    LOOP = 74,
+    ENDLOOP = 75,
+    EXCLAIM = 76,
+    PLUSPLUS = 78,
+    EQ = 80,
+    NEQ = 81,
+    LT = 83,
+    GT = 85,
+    SCONV = 104,
+    PCONV = 105,
+    PMCONV = 106,
+    CBRANCH = 109,
+    EPVAL = 110,
+    ENDINIT = 112,
+    BRANCH = 114,
+    URETURN = 118,
+    NASSERT = 123,
+    ASSERT = 124,
+    ICALL = 129,
+    MCALL = 132,
+    UMCALL = 133,
 };
 }
 
 // Writes one unit; then `optimize` runs the tool on it and `dump` shows what came out.
-class UnitTest : public testing::Test {
+class UnitTest : public testing::Test, protected IC_BUILDER {
 protected:
     UnitTest() {
-        TYPE_PKG::init_type_pkg(&pkg);
-        tp = &pkg;
-        if_node_table_init();
         out = open_memstream(&bytes, &size);
-        file = I_FILE::if_create(out, &pkg, "unit.c");
+        start(out, "unit.c");
         int_fn = function_type({}, pkg.int_t);
     }
     ~UnitTest() override { std::free(bytes); }
 
     // ---- Types and symbols
-    TYPE* function_type(const std::vector<TYPE*>& params, TYPE* result) {
-        fkPARAM* list = nullptr;
-        for (auto it = params.rbegin(); it != params.rend(); ++it) {
-            auto* p = new fkPARAM;
-            p->type = *it;
-            p->next = list;
-            list = p;
-        }
-        TYPE* t = pkg.mk_func(result, false, false, true, 0, 32, 32);
-        pkg.set_params(t, list);
-        pkg.type_frozen(t);
-        return t;
-    }
-    IC_SYMBOL* symbol(const char* name, TYPE* type, int sclass) {
-        auto* s = new IC_SYMBOL;
-        owned.emplace_back(s);
-        s->name = name;
-        s->type = type;
-        s->size = type->size;
-        s->align = type->align;
-        s->sclass = static_cast<int8_t>(sclass);
-        file->if_reference_type(type);
-        return s;
-    }
-    IC_SYMBOL* global(const char* name, TYPE* type, int sclass = 2) {
-        IC_SYMBOL* s = symbol(name, type, sclass);
-        file->if_enter_global(s);
-        return s;
-    }
     IC_SYMBOL* pragma(IC_SYMBOL* s, int kind, std::vector<std::string> args = {}) {
         auto p = std::make_unique<PRAGMA>();
         p->kind = static_cast<uint8_t>(kind);
         p->args = std::move(args);
         s->add_pragma(std::move(p));
-        return s;
-    }
-    IC_SYMBOL* local(const char* name, TYPE* type, int sclass = 1) {
-        IC_SYMBOL* s = symbol(name, type, sclass);
-        file->if_enter_local(s);
-        file->if_write_symbol(s);
         return s;
     }
 
@@ -103,15 +111,6 @@ protected:
     void set(IC_SYMBOL* s, IC_NODE* value) { statement(node(op::ASG, s->type, name(s), value)); }
 
     // ---- Trees
-    IC_NODE* node(int opcode, TYPE* type, IC_NODE* left = nullptr, IC_NODE* right = nullptr) {
-        auto* n = new (arena.take(sizeof(IC_NODE))) IC_NODE(&arena);
-        n->op = opcode;
-        n->type = type;
-        n->left = left;
-        n->right = right;
-        file->if_reference_type(type);
-        return n;
-    }
     IC_NODE* name(IC_SYMBOL* s) {
         IC_NODE* n = node(op::NAME, s->type);
         n->sym = s;
@@ -163,7 +162,8 @@ protected:
         return lines;
     }
     // Runs at a level and expects these lines one behind the other, with anything between.
-    void expect_lines(const std::vector<std::string>& wanted, const std::vector<std::string>& options = {"--opt_level=off"}) {
+    void expect_lines(const std::vector<std::string>& wanted,
+                      const std::vector<std::string>& options = {"--opt_level=off"}) {
         const RESULT r = optimize(options);
         ASSERT_EQ(r.status, 0) << r.err;
         const std::string text = dump();
@@ -174,9 +174,7 @@ protected:
             from = at + line.size() + 1;
         }
     }
-    void expect_no_line(const std::string& line) {
-        EXPECT_EQ(dump().find(line), std::string::npos) << dump();
-    }
+    void expect_no_line(const std::string& line) { EXPECT_EQ(dump().find(line), std::string::npos) << dump(); }
     // The input is refused with this text, and leaves nothing behind.
     void expect_refusal(const std::string& text) {
         const RESULT r = optimize();
@@ -196,13 +194,9 @@ protected:
         return text;
     }
 
-    TYPE_PKG pkg;
     char* bytes = nullptr;
     size_t size = 0;
     FILE* out;
-    I_FILE* file;
-    IC_ARENA arena;
-    std::vector<std::unique_ptr<IC_SYMBOL>> owned;
     PSN psn{"unit.c", 1, 1};
     TYPE* int_fn;
     IC_SYMBOL *main_sym = nullptr, *x = nullptr, *y = nullptr;

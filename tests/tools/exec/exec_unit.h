@@ -2,6 +2,7 @@
 #pragma once
 
 #include "tools/exec/exec.h"
+#include "tools/model/ic_builder.h"
 
 #include <gtest/gtest.h>
 
@@ -62,47 +63,17 @@ enum : int {
     UMCALL = 133,
 };
 
-class ExecTest : public testing::Test {
+class ExecTest : public testing::Test, protected IC_BUILDER {
 protected:
-    ExecTest() : pkg(*ic_type_package()) {
-        if_node_table_init();
+    ExecTest() : IC_BUILDER(*ic_type_package()) {
         out = open_memstream(&bytes, &size);
-        file = I_FILE::if_create(out, &pkg, "unit.c");
+        start(out, "unit.c");
         main_fn = function_type({}, pkg.int_t);
         main_sym = global("_main", main_fn);
         put_i64 = library("_put_i64", {pkg.llong_t}, pkg.void_t);
     }
     ~ExecTest() override { std::free(bytes); }
 
-    TYPE* function_type(const std::vector<TYPE*>& params, TYPE* result, bool variadic = false) {
-        fkPARAM* list = nullptr;
-        for (auto it = params.rbegin(); it != params.rend(); ++it) {
-            auto* p = new fkPARAM;
-            p->type = *it;
-            p->next = list;
-            list = p;
-        }
-        TYPE* t = pkg.mk_func(result, false, variadic, true, 0, 32, 32);
-        pkg.set_params(t, list);
-        pkg.type_frozen(t);
-        return t;
-    }
-    IC_SYMBOL* symbol(const char* name, TYPE* type, int sclass) {
-        symbols.emplace_back(new IC_SYMBOL);
-        IC_SYMBOL* s = symbols.back().get();
-        s->name = name;
-        s->type = type;
-        s->size = type->size;
-        s->align = type->align;
-        s->sclass = static_cast<int8_t>(sclass);
-        file->if_reference_type(type);
-        return s;
-    }
-    IC_SYMBOL* global(const char* name, TYPE* type, int sclass = 2) {
-        IC_SYMBOL* s = symbol(name, type, sclass);
-        file->if_enter_global(s);
-        return s;
-    }
     // A function that the executor has.
     IC_SYMBOL* library(const char* name, const std::vector<TYPE*>& params, TYPE* result) {
         return global(name, function_type(params, result), 5);
@@ -113,21 +84,6 @@ protected:
         file->if_enter_local(s);
         file->if_write_symbol(s);
         return s;
-    }
-    IC_SYMBOL* local(const char* name, TYPE* type) {
-        IC_SYMBOL* s = symbol(name, type, 1);
-        file->if_enter_local(s);
-        file->if_write_symbol(s);
-        return s;
-    }
-    IC_NODE* node(int opcode, TYPE* type, IC_NODE* left = nullptr, IC_NODE* right = nullptr) {
-        auto* n = new (arena.take(sizeof(IC_NODE))) IC_NODE(&arena);
-        n->op = opcode;
-        n->type = type;
-        n->left = left;
-        n->right = right;
-        file->if_reference_type(type);
-        return n;
     }
     IC_NODE* name(IC_SYMBOL* s) {
         IC_NODE* n = node(NAME, s->type);
@@ -241,13 +197,9 @@ protected:
         EXPECT_NE(r.error.find("in main, line"), std::string::npos) << r.error;
     }
 
-    TYPE_PKG& pkg;
     char* bytes = nullptr;
     size_t size = 0;
     FILE* out = nullptr;
-    I_FILE* file = nullptr;
-    IC_ARENA arena;
-    std::vector<std::unique_ptr<IC_SYMBOL>> symbols;
     IC_SYMBOL *main_sym, *put_i64;
     TYPE* main_fn = nullptr;
     PSN psn{"unit.c", 0, 1};

@@ -194,18 +194,3 @@ INT65 common_prefix(INT65 low, INT65 high) {
 
 INT65 find_known_zeros_in_range(INT65 low, INT65 high) { return ~high & common_prefix(low, high); }
 INT65 find_known_ones_in_range(INT65 low, INT65 high) { return high & common_prefix(low, high); }
-
-bool tree_is_non_negative(const NODE* tree, struct LOOP*) {
-    if (!is_integer(tree->type)) return false;
-    return !is_signed(tree->type) || (known_bits(tree).zeros & sign_bit(tree->type)) != 0;
-}
-
-bool tree_is_negative(const NODE* tree, struct LOOP*) {
-    return is_integer(tree->type) && is_signed(tree->type) && (known_bits(tree).ones & sign_bit(tree->type)) != 0;
-}
-
-bool tree_is_zero(const NODE* tree, struct LOOP*) {
-    return is_integer(tree->type) && known_bits(tree).zeros == mask_of(tree->type);
-}
-
-bool tree_is_non_zero(const NODE* tree, struct LOOP*) { return is_integer(tree->type) && known_bits(tree).ones != 0; }

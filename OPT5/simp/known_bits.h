@@ -2,10 +2,9 @@
 #pragma once
 
 #include "OPT5/ir/node.h"
+#include "OPT5/simp/symbolic.h"
 
 #include <cstdint>
-
-struct LOOP;
 
 // Bits of a value at its type's width that are zero, or one, whatever the variables hold. A bit is in at most one mask.
 struct KNOWN_BITS {
@@ -24,10 +23,3 @@ INT65 find_known_zeros_in_ANDB(const NODE* tree, TYPE* type);
 // Bits that are equal in every value from `low` to `high`, as masks of 65-bit values.
 INT65 find_known_zeros_in_range(INT65 low, INT65 high);
 INT65 find_known_ones_in_range(INT65 low, INT65 high);
-
-// Whether the value is known not to be negative, to be negative, to be zero, or not to be zero. A `loop` that is not
-// null is the one that the tree stands in; its facts may be used.
-bool tree_is_non_negative(const NODE* tree, struct LOOP* loop);
-bool tree_is_negative(const NODE* tree, struct LOOP* loop);
-bool tree_is_zero(const NODE* tree, struct LOOP* loop);
-bool tree_is_non_zero(const NODE* tree, struct LOOP* loop);

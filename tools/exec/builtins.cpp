@@ -1,11 +1,11 @@
-// Built-in functions of the target whose result their operands and their definition fix. The others cannot be executed:
-//   - what hangs on the carry or on the overflow counter: __addcu __sbbu __rol __ror __rpt_rol __rpt_ror __sat;
-//   - steps whose result the hardware's table alone tells: __subcu __subcul __rpt_subcu __rpt_subcul __rpt_norm_inc
-//     __rpt_norm_dec __quadf32, and estimates: __einvf32 __einvf64 __eisqrtf32 __eisqrtf64;
-//   - whose rounding, bounds or counts are not settled: __qmpy32 __qmpy32by16 __IQxmpy __sat32 __sathigh16 __atan2puf32
-//     __rpt_mac __rpt_mov_imm __rpt_mov_imm_far;
-//   - addresses of half a unit or of a peripheral: __byte __byte_peripheral_32;
-//   - generic forms without a name on this target (saturating arithmetic, words, unaligned access).
+// Built-in functions of the target whose result their operands and their definition fix; each row of the table is the
+// definition. Three conventions hold for all of them:
+//   - a function that is marked as free of side effects is a function of its operands alone: a rotation is one of the
+//   32
+//     bits of its operand, without the carry;
+//   - a repeated step (__rpt_...) is done as often as the last operand says, and not at all for a count below 1;
+//   - a product in fixed point is exact in 64 bits, shifted right arithmetically and cut to its type.
+// What hangs on more than the operands, or is not settled, is listed in `refused` with the reason.
 //
 // The multiply-accumulate forms pass the accumulator A and the product holder P by reference. Each adds the last
 // product, shifted by the product mode, to A and then puts this product in P: A and P have the types that the
@@ -91,6 +91,53 @@ int64_t normalized(A& a, unsigned bits) {
         }
     write(a, 1, s16, n);
     return v;
+}
+// At most n steps of normalization of operand 0; each moves the count in operand 1 by `step`. Zero is normal.
+int64_t norm_steps(A& a, int step) {
+    int64_t v = wrap(a.i(0), 32, true), count = a.i(1);
+    for (int64_t n = a.i(2); n > 0 && v != 0 && v >> 30 == v >> 31; n--, count += step) v *= 2;
+    return count;
+}
+int64_t rotated(uint64_t v, int64_t left) {
+    const uint32_t w = static_cast<uint32_t>(v);
+    const unsigned n = static_cast<unsigned>(left & 31);
+    return static_cast<int64_t>(n ? w << n | w >> (32 - n) : w);
+}
+int64_t count(A& a, size_t k) { return std::max<int64_t>(a.i(k), 0); }
+
+// Steps of unsigned division by conditional subtraction. The accumulator holds the remainder above the quotient; a
+// step shifts it left by one and, where the divisor goes into the remainder, takes it off and sets the quotient's new
+// bit. Sixteen steps on a dividend in the low half leave the remainder in the high half and the quotient in the low.
+int64_t divide_steps(uint32_t acc, uint16_t divisor, int64_t n) {
+    for (; n > 0; n--) {
+        const uint64_t shifted = uint64_t{acc} << 1, taken = uint64_t{divisor} << 16;
+        acc = static_cast<uint32_t>(shifted >= taken ? shifted - taken + 1 : shifted);
+    }
+    return acc;
+}
+// The same with remainder and quotient of 32 bits each: the quotient moves up in operand 0, whose top bit enters the
+// remainder, where operand 2 points.
+int64_t long_divide_steps(A& a, int64_t n) {
+    const SHAPE u32 = int_shape(32, false);
+    uint32_t quotient = static_cast<uint32_t>(a.i(0));
+    uint64_t remainder = static_cast<uint64_t>(a.m.load(u32, a.p(2)));
+    const uint64_t divisor = static_cast<uint32_t>(a.i(1));
+    for (; n > 0; n--) {
+        remainder = remainder << 1 | quotient >> 31;
+        quotient <<= 1;
+        if (remainder >= divisor) {
+            remainder -= divisor;
+            quotient |= 1;
+        }
+        remainder &= 0xFFFFFFFF;
+    }
+    a.m.store(u32, a.p(2), static_cast<int64_t>(remainder));
+    return quotient;
+}
+void fill(A& a) {
+    const int64_t n = count(a, 2);
+    if (n) a.m.check(a.p(0), static_cast<uint64_t>(n));
+    for (int64_t i = 0; i < n; i++) a.m.memory[a.p(0) + static_cast<uint64_t>(i)] = static_cast<uint16_t>(a.i(1));
 }
 int64_t byte_at(A& a) {
     const uint64_t i = static_cast<uint16_t>(a.i(1)), at = a.p(0) + i / 2;
@@ -180,6 +227,19 @@ const LIBRARY_ENTRY entries[] = {
     INT("__IQ", whole(a.f(0) * std::ldexp(1.0, static_cast<int>(a.i(1))))),
     INT("__IQmpy", wrap(a.i(0), 32, true) * wrap(a.i(1), 32, true) >> (a.i(2) & 63)),
     INT("__IQsat", std::max(std::min(a.i(0), a.i(1)), a.i(2))),
+    INT("__qmpy32", wrap(a.i(0), 32, true) * wrap(a.i(1), 32, true) >> (a.i(2) & 63)),
+    INT("__qmpy32by16", wrap(a.i(0), 32, true) * wrap(a.i(1), 16, true) >> (a.i(2) & 63)),
+    INT("__rol", rotated(static_cast<uint64_t>(a.i(0)), 1)),
+    INT("__ror", rotated(static_cast<uint64_t>(a.i(0)), -1)),
+    INT("__rpt_rol", rotated(static_cast<uint64_t>(a.i(0)), count(a, 1))),
+    INT("__rpt_ror", rotated(static_cast<uint64_t>(a.i(0)), -count(a, 1))),
+    INT("__subcu", divide_steps(static_cast<uint32_t>(a.i(0)), static_cast<uint16_t>(a.i(1)), 1)),
+    INT("__rpt_subcu", divide_steps(static_cast<uint32_t>(a.i(0)), static_cast<uint16_t>(a.i(1)), count(a, 2))),
+    INT("__subcul", long_divide_steps(a, 1)),
+    INT("__rpt_subcul", long_divide_steps(a, count(a, 3))),
+    INT("__rpt_norm_inc", norm_steps(a, 1)),
+    INT("__rpt_norm_dec", norm_steps(a, -1)),
+    NOTHING("__rpt_mov_imm", fill(a)),
     INT("__abs16_sat", std::min<int64_t>(std::abs(wrap(a.i(0), 16, true)), 32767)),
     INT("__satlow16", std::clamp<int64_t>(wrap(a.i(0), 32, true), -32768, 32767)),
     INT("__flip16", reversed(static_cast<uint64_t>(a.i(0)), 16)),
@@ -213,6 +273,7 @@ const LIBRARY_ENTRY entries[] = {
     FLOAT("__sinpuf32", single(std::sin(a.f(0) * two_pi))),
     FLOAT("__cospuf32", single(std::cos(a.f(0) * two_pi))),
     FLOAT("__atanpuf32", single(std::atan(a.f(0)) / two_pi)),
+    FLOAT("__atan2puf32", single(std::atan2(a.f(0), a.f(1)) / two_pi)),
     INT("__f32toi16r", whole(std::clamp(std::nearbyint(a.f(0)), -32768.0, 32767.0))),
     INT("__f32toui16r", whole(std::clamp(std::nearbyint(a.f(0)), 0.0, 65535.0))),
     NOTHING("__f32_max_idx", index_of_extreme(a, float_shape(32), true)),
@@ -236,10 +297,43 @@ const LIBRARY_ENTRY entries[] = {
     NOTHING("BARRIER_WITH_ARG", (void)0),
     NOTHING("_never_executed", a.m.fail(EXEC_UNREACHABLE, "reached a place that is never executed")),
 };
+
+// Built-in functions that cannot be executed, and why.
+const char carry[] = "its result hangs on the carry", counter[] = "its result hangs on the overflow counter";
+const char estimate[] = "the estimate's bits are the hardware's own", bounds[] = "its bounds are not settled";
+const char half_unit[] = "its result is the address of half a unit";
+const struct {
+    const char *name, *why;
+} refused[] = {
+    {"__addcu", carry},
+    {"__sbbu", carry},
+    {"ETSI_L_ADD_C", carry},
+    {"ETSI_L_SUB_C", carry},
+    {"__sat", counter},
+    {"ETSI_L_SAT", counter},
+    {"__sat32", bounds},
+    {"__sathigh16", bounds},
+    {"__einvf32", estimate},
+    {"__einvf64", estimate},
+    {"__eisqrtf32", estimate},
+    {"__eisqrtf64", estimate},
+    {"__quadf32", "the numbers of the quadrants are not settled"},
+    {"__IQxmpy", "the position of the product's point is not settled"},
+    {"__rpt_mac", "where its second operand lies is not settled"},
+    {"__rpt_mov_imm_far", "the pointer that it returns is not settled"},
+    {"__byte", half_unit},
+    {"__byte_peripheral_32", "it is for a peripheral's registers"},
+};
 #undef INT
 #undef FLOAT
 #undef NOTHING
 } // namespace
+
+const char* builtin_refusal(const std::string& name) {
+    for (const auto& r : refused)
+        if (name == r.name) return r.why;
+    return nullptr;
+}
 
 const LIBRARY_ENTRY* find_builtin(const std::string& name) {
     static const auto table = [] {
@@ -248,5 +342,5 @@ const LIBRARY_ENTRY* find_builtin(const std::string& name) {
         return t;
     }();
     auto it = table.find(name);
-    return it == table.end() ? nullptr : it->second;
+    return it == table.end() ? find_basic_operator(name) : it->second;
 }

@@ -151,6 +151,8 @@ private:
 
     // compile_parts.cpp: complex numbers and vectors
     const XNODE* parts(const IC_NODE* n);
+    const XNODE* lanes(const IC_NODE* n);
+    const XNODE* lane_operation(const IC_NODE* n, const SHAPE& a, const SHAPE& b, const SHAPE& to);
 
     // compile_stmt.cpp
     void lay_out_frame();

@@ -130,6 +130,10 @@ const XNODE* COMPILER::intrinsic(const IC_NODE* n) {
                 return convert(finish(site, call_direct), site.target->result, site.result);
             }
     if (!site.library) site.library = find_library(site.name);
-    if (!site.library) return failing(EXEC_UNSUPPORTED, "cannot execute the built-in function " + site.name);
+    if (!site.library) {
+        const char* why = builtin_refusal(site.name);
+        return failing(EXEC_UNSUPPORTED,
+                       "cannot execute the built-in function " + site.name + (why ? std::string(": ") + why : ""));
+    }
     return finish(site, call_library);
 }

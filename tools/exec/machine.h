@@ -207,6 +207,8 @@ struct LIBRARY_ENTRY {
     char result; // i integer, f double, v none
     int64_t (*run)(LIBRARY_ARGS&);
 };
-const LIBRARY_ENTRY* find_library(const std::string& name); // functions called by name
-const LIBRARY_ENTRY* find_builtin(const std::string& name); // built-in functions of the target
+const LIBRARY_ENTRY* find_library(const std::string& name);        // functions called by name
+const LIBRARY_ENTRY* find_builtin(const std::string& name);        // built-in functions of the target
+const LIBRARY_ENTRY* find_basic_operator(const std::string& name); // of saturating arithmetic
+const char* builtin_refusal(const std::string& name); // why one cannot be executed; null for a name that is unknown
 int64_t run_library(const LIBRARY_ENTRY& entry, LIBRARY_ARGS& args, const SHAPE& result);

@@ -35,6 +35,24 @@ TEST_F(ExecTest, BuiltInFunctionsOfIntegers) {
         {"__IQmpy", l, l, {2147483647, 2147483647, 32}, 1073741823},
         {"__IQsat", l, l, {900, 500, -500}, 500},
         {"__IQsat", l, l, {-900, 500, -500}, -500},
+        {"__qmpy32", l, l, {-3 * (1 << 20), 1 << 23, 24}, -3 * (1 << 19)},
+        {"__qmpy32", l, l, {-1, 1, 4}, -1},
+        {"__qmpy32by16", l, l, {1 << 30, -32768, 31}, -16384},
+        {"__qmpy32by16", l, l, {5, 65535, 0}, -5}, // the second factor is an int
+        {"__rol", l, l, {-2147483647}, 3},
+        {"__ror", l, l, {3}, -2147483647},
+        {"__rpt_rol", l, l, {0x12345678, 8}, 0x34567812},
+        {"__rpt_ror", l, l, {0x12345678, 36}, -0x7EDCBA99},
+        {"__rpt_rol", l, l, {0x12345678, -3}, 0x12345678},
+        {"__subcu", l, l, {0x8000, 1}, 1},
+        {"__subcu", l, l, {0x4000, 1}, 0x8000},
+        {"__subcu", l, l, {-1, -1}, 65535}, // 33 bits between
+        {"__rpt_subcu", l, l, {50000, 7, 16}, 6 * 65536 + 7142},
+        {"__rpt_subcu", l, l, {50000, 7, 0}, 50000},
+        {"__rpt_norm_inc", i, l, {1, 100, 16}, 116},
+        {"__rpt_norm_inc", i, l, {1, 100, 40}, 130},
+        {"__rpt_norm_dec", i, l, {-65536, 100, 16}, 85},
+        {"__rpt_norm_dec", i, l, {0, 100, 16}, 100},
     };
     begin(main_sym);
     body();
@@ -50,6 +68,113 @@ TEST_F(ExecTest, BuiltInFunctionsOfIntegers) {
     ret(0);
     end();
     expect_output(expected);
+}
+
+// The operators of saturating arithmetic: `s` results and operands are 16 bits, `l` 32.
+TEST_F(ExecTest, BasicOperators) {
+    const int64_t top = 2147483647, bottom = -top - 1;
+    struct {
+        const char* name;
+        std::vector<int64_t> operands;
+        int64_t expected;
+    } const rows[] = {
+        {"ETSI_ABS_S", {-32768}, 32767},
+        {"ETSI_ADD", {30000, 3000}, 32767},
+        {"ETSI_SUB", {-30000, 3000}, -32768},
+        {"ETSI_DIV_S", {1, 3}, 10922},
+        {"ETSI_DIV_S", {7, 7}, 32767},
+        {"ETSI_MULT", {-32768, -32768}, 32767},
+        {"ETSI_MULT", {-1, 1}, -1},
+        {"ETSI_MULT_R", {-1, 1}, 0},
+        {"ETSI_NEGATE", {-32768}, 32767},
+        {"ETSI_NORM_S", {0}, 0},
+        {"ETSI_NORM_S", {-1}, 15},
+        {"ETSI_NORM_S", {0x3FFF}, 1},
+        {"ETSI_NORM_L", {-1}, 31},
+        {"ETSI_NORM_L", {bottom}, 0},
+        {"ETSI_ROUND", {0x7FFF8000}, 32767},
+        {"ETSI_ROUND", {0x18000}, 2},
+        {"ETSI_SHL", {-3, 14}, -32768},
+        {"ETSI_SHL", {1, 100}, 32767},
+        {"ETSI_SHL", {-3, -1}, -2},
+        {"ETSI_SHR", {-3, 100}, -1},
+        {"ETSI_SHR_R", {3, 1}, 2},
+        {"ETSI_SHR_R", {-3, 16}, 0},
+        {"ETSI_SHIFT_R", {3, -1}, 2},
+        {"ETSI_EXTRACT_H", {-1}, -1},
+        {"ETSI_EXTRACT_L", {0x18000}, -32768},
+        {"ETSI_L_ABS", {bottom}, top},
+        {"ETSI_L_ADD", {top, 1}, top},
+        {"ETSI_L_SUB", {bottom, 1}, bottom},
+        {"ETSI_L_DEPOSIT_H", {-1}, -65536},
+        {"ETSI_L_DEPOSIT_L", {-1}, -1},
+        {"ETSI_L_MULT", {-32768, -32768}, top},
+        {"ETSI_L_MAC", {top, 1, 1}, top},
+        {"ETSI_L_MSU", {0, -32768, -32768}, -top},
+        {"ETSI_MAC_R", {0x7FFF, 1, 1}, 1},
+        {"ETSI_MSU_R", {0x8000, 1, 1}, 0},
+        {"ETSI_L_NEGATE", {bottom}, top},
+        {"ETSI_L_SHL", {1, 31}, top},
+        {"ETSI_L_SHR_R", {-1, 1}, 0},
+        {"ETSI_L_SHIFT_R", {5, -1}, 3},
+    };
+    begin(main_sym);
+    body();
+    std::string expected;
+    for (const auto& r : rows) {
+        std::vector<IC_NODE*> operands;
+        for (int64_t v : r.operands) operands.push_back(num(v, pkg.long_t));
+        IC_NODE* n = node(ICALL, pkg.long_t, list(operands));
+        n->text = r.name;
+        put(n);
+        expected += std::to_string(r.expected) + "\n";
+    }
+    ret(0);
+    end();
+    expect_output(expected);
+}
+
+// Remainder and quotient of 32 bits; a divisor with its top bit set needs the 33rd bit of the remainder.
+TEST_F(ExecTest, LongDivisionBySteps) {
+    const int64_t rows[][5] = {// dividend, divisor, steps: quotient, remainder
+                               {4000000000, 7, 32, 571428571, 3},
+                               {4294967295, 4294967294, 32, 1, 1},
+                               {0x80000000, 1, 1, 1, 0}};
+    TYPE *ul = pkg.ulong_t, *to_ul = pkg.mk_ptr(ul);
+    begin(main_sym);
+    IC_SYMBOL* rest = local("rest", ul);
+    body();
+    std::string expected;
+    for (const auto& r : rows) {
+        statement(set(rest, num(0, ul)));
+        IC_NODE* n =
+            node(MCALL, ul, list({num(r[0], ul), num(r[1], ul), node(UAND, to_ul, name(rest)), num(r[2], pkg.int_t)}));
+        n->text = "__rpt_subcul";
+        put(n);
+        put(name(rest));
+        expected += std::to_string(r[3]) + "\n" + std::to_string(r[4]) + "\n";
+    }
+    ret(0);
+    end();
+    expect_output(expected);
+}
+
+TEST_F(ExecTest, RepeatedStoresFill) {
+    TYPE* to_void = pkg.mk_ptr(pkg.void_t);
+    begin(main_sym);
+    IC_SYMBOL* words = local("words", pkg.long_t);
+    body();
+    for (int64_t n : {0, 1, 2}) {
+        statement(set(words, num(0x50006, pkg.long_t)));
+        IC_NODE* fill =
+            node(MCALL, pkg.void_t, list({node(UAND, to_void, name(words)), num(-1, pkg.int_t), num(n, pkg.int_t)}));
+        fill->text = "__rpt_mov_imm";
+        statement(fill);
+        put(name(words));
+    }
+    ret(0);
+    end();
+    expect_output("327686\n393215\n-1\n");
 }
 
 TEST_F(ExecTest, BuiltInFunctionsOfSingles) {
@@ -69,6 +194,8 @@ TEST_F(ExecTest, BuiltInFunctionsOfSingles) {
         {"__f32toi16r", pkg.int_t, "-1e9", nullptr, nullptr, -262144},
         {"__f32toui16r", pkg.uint_t, "-3", nullptr, nullptr, 0},
         {"__sinpuf32", pkg.float_t, "0.25", nullptr, nullptr, 8},
+        {"__atan2puf32", pkg.float_t, "1", "0", nullptr, 2},
+        {"__atan2puf32", pkg.float_t, "-1", "-1", nullptr, -3},
     };
     begin(main_sym);
     body();

@@ -121,10 +121,10 @@ TEST_F(ExecTest, BuiltInFunctionOfHiddenStateIsRefused) {
     begin(main_sym);
     body();
     IC_NODE* turn = node(MCALL, pkg.long_t, num(1, pkg.long_t));
-    turn->text = "__rol";
+    turn->text = "__sat";
     statement(turn);
     end();
-    expect_error(EXEC_UNSUPPORTED, "__rol");
+    expect_error(EXEC_UNSUPPORTED, "__sat: its result hangs on the overflow counter");
 }
 
 TEST_F(ExecTest, BranchToNoLabelIsReported) {

@@ -4,6 +4,10 @@
 Every tests/programs/NAME.c is parsed and executed, and must print NAME.expected. It is then optimized at every level
 and at both ends of the size goal, with the checker between steps, executed and compared. What was optimized is
 optimized once more: an output is a valid input, and must still print the same.
+
+A program may begin with comments that say how it is built:
+  // parse: WORD...      words for the parser; a file name with .c is a further file of the unit, in this folder
+  // optimize: WORD...   every level is taken with these words too; such a line may be repeated
 """
 import argparse
 import sys
@@ -20,13 +24,30 @@ SIZE_GOALS = ("0", "5")
 CHECK = "--debug:validate"
 
 
-def variants(levels):
-    """(name, option words) of each way a program is optimized."""
+def directives(source, key):
+    """The words of each `// key:` line at the head of a program."""
+    for line in source.read_text().splitlines():
+        if not line.startswith("//"):
+            return
+        if line.startswith(f"// {key}:"):
+            yield line.split(":", 1)[1].split()
+
+
+def parser_words(source):
+    return [source.parent / word if word.endswith(".c") else word
+            for words in directives(source, "parse") for word in words]
+
+
+def variants(levels, more=()):
+    """(name, option words) of each way a program is optimized; `more` are its own sets of words."""
     for level in levels:
         yield f"level {level}", [f"--opt_level={level}", CHECK]
     if "2" in levels:
         for goal in SIZE_GOALS:
             yield f"level 2 goal {goal}", ["--opt_level=2", f"--size_speed_goal={goal}", CHECK]
+    for words in more:
+        for level in levels:
+            yield f"level {level} {' '.join(words)}", [f"--opt_level={level}", *words, CHECK]
 
 
 def judge_variant(tools, unit, want, name, words):
@@ -53,14 +74,14 @@ def judge_program(tools, source, levels, folder):
     want = Outcome(0, expected.read_text())
     unit = Path(folder) / f"{source.stem}.if"
     try:
-        tools.parse(source, unit)
+        tools.parse(source, unit, parser_words(source))
         found = difference(want, tools.execute(unit))
     except Trouble as trouble:
         found = str(trouble)
     if found:
         return [f"unoptimized: {found}"]
     failures = []
-    for name, words in variants(levels):
+    for name, words in variants(levels, directives(source, "optimize")):
         failures += judge_variant(tools, unit, want, name, words)
     return failures
 

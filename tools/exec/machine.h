@@ -144,7 +144,8 @@ constexpr uint64_t function_space = 0x70000000; // addresses of functions, beyon
 
 struct MACHINE {
     std::vector<uint16_t> memory;
-    uint64_t size = 0; // units
+    uint64_t size = 0;       // units
+    bool big_endian = false; // a number's high unit comes first; fields keep their places within units
     uint64_t fp = 0, sp = 0;
     uint64_t steps = 0, step_limit = ~uint64_t{0};
     uint64_t heap_begin = 0, heap_end = 0;
@@ -169,13 +170,17 @@ struct MACHINE {
         if (address < null_page || address >= size || units > size - address) bad_address(address, units);
     }
     uint64_t get(uint64_t address, unsigned units) const { // unchecked
+        if (big_endian) return get_reversed(address, units);
         uint64_t v = memory[address];
         for (unsigned i = 1; i < units; i++) v |= static_cast<uint64_t>(memory[address + i]) << 16 * i;
         return v;
     }
     void put(uint64_t address, unsigned units, uint64_t v) {
+        if (big_endian) return put_reversed(address, units, v);
         for (unsigned i = 0; i < units; i++) memory[address + i] = static_cast<uint16_t>(v >> 16 * i);
     }
+    uint64_t get_reversed(uint64_t address, unsigned units) const;
+    void put_reversed(uint64_t address, unsigned units, uint64_t v);
     int64_t load(const SHAPE& shape, uint64_t address) const; // checked, by shape
     void store(const SHAPE& shape, uint64_t address, int64_t value);
     // Arguments in the shapes of the parameters; those beyond, in shapes of their own, go to a variadic function.

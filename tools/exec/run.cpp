@@ -154,6 +154,14 @@ int run_main(PROGRAM& p) {
     }
     return status;
 }
+// What the unit's option words say about names and memory.
+void obey_options(const IC_UNIT& unit, PROGRAM& p) {
+    for (const OPTION_SET& set : unit.option_sets)
+        for (const std::string& word : set.options) {
+            if (word.find("eabi") != std::string::npos) p.name_prefix = false;
+            if (word == "-e" || word == "--big_endian" || word == "--endian=big") p.m.big_endian = true;
+        }
+}
 } // namespace
 
 EXEC_RESULT execute(const IC_UNIT& unit, const EXEC_OPTIONS& options, FILE* out, FILE* report) {
@@ -161,9 +169,7 @@ EXEC_RESULT execute(const IC_UNIT& unit, const EXEC_OPTIONS& options, FILE* out,
     PROGRAM p(unit, options);
     p.m.out = out;
     if (options.max_steps) p.m.step_limit = options.max_steps;
-    for (const OPTION_SET& set : unit.option_sets)
-        for (const std::string& word : set.options)
-            if (word.find("eabi") != std::string::npos) p.name_prefix = false;
+    obey_options(unit, p);
     run_on_big_stack(host_stack, [&] {
         p.m.host_stack_end = reinterpret_cast<uintptr_t>(__builtin_frame_address(0)) - host_stack + host_stack_reserve;
         try {

@@ -138,6 +138,16 @@ void MACHINE::unaligned(uint64_t address) const {
     fail(EXEC_UNALIGNED, "access to an unaligned object, address " + std::to_string(address));
 }
 
+uint64_t MACHINE::get_reversed(uint64_t address, unsigned units) const {
+    uint64_t v = 0;
+    for (unsigned i = 0; i < units; i++) v = v << 16 | memory[address + i];
+    return v;
+}
+
+void MACHINE::put_reversed(uint64_t address, unsigned units, uint64_t v) {
+    for (unsigned i = units; i-- > 0; v >>= 16) memory[address + i] = static_cast<uint16_t>(v);
+}
+
 int64_t MACHINE::load(const SHAPE& shape, uint64_t address) const {
     if (shape.rep == R_AGG || shape.rep == R_FUNC) return static_cast<int64_t>(address);
     check(address, shape.units);

@@ -22,7 +22,7 @@ def parse_arguments(arguments):
     parser.add_argument("--set", nargs=2, metavar=("N", "WORD"), help="a word of option set N")
     parser.add_argument("-w", dest="quiet", action="store_true", help="no warnings")
     rest, sets = take_option_words(arguments, parser)
-    options = parser.parse_args(rest)
+    options = parser.parse_intermixed_args(rest)
     options.sets = sets
     return options
 
@@ -49,6 +49,9 @@ def translate(options):
     T.set_abi(options.abi == "eabi")
     unit, linked = Unit(os.path.basename(options.files[0])), {}
     unit.option_sets = options.sets
+    if options.abi == "eabi":
+        unit.name_prefix = ""
+        unit.option_sets.setdefault(0, []).insert(0, "--abi=eabi")
     for path in options.files:
         tree = preprocess.parse(path, options.include, options.define, options.abi == "eabi")
         Translator(unit, linked, None if options.quiet else sys.stderr).file(tree)

@@ -106,6 +106,7 @@ class Unit:
         self.items = []      # FunctionBody and Text of file scope, in order
         self.tentative = []    # symbols that get zeros if no file initializes them
         self.option_sets = {}  # number: [word...]
+        self.name_prefix = "_"  # of the linker's names; the new ABI has none
         self.serial = 0
 
     def new_symbol(self, name, type_, klass, position):

@@ -208,10 +208,10 @@ class Translator:
         # An inline function without "extern" has its definition for this file alone.
         local = "static" in storage or ("inline" in (specifiers or []) and "extern" not in storage)
         if local:
-            return self.unit.new_symbol("_" + name, type_, Symbol.STATIC, where)
+            return self.unit.new_symbol(self.unit.name_prefix + name, type_, Symbol.STATIC, where)
         first = self.linked.get(name)
         if first is None:
-            first = self.linked[name] = self.unit.new_symbol("_" + name, type_, Symbol.EXTERNAL, where)
+            first = self.linked[name] = self.unit.new_symbol(self.unit.name_prefix + name, type_, Symbol.EXTERNAL, where)
             return first
         view = Symbol(first.name, type_, first.klass, 0, where)  # this file's view of another file's symbol
         view.link = first
@@ -351,7 +351,8 @@ def finish(unit):
             if not symbol.type.complete and T.is_array(symbol.type):
                 symbol.type = T.Array(T.strip(symbol.type).element, 1)
             if not symbol.type.complete:
-                raise CompileError(symbol.position, f"'{symbol.name[1:]}' has incomplete type '{symbol.type}'")
+                name = symbol.name[len(unit.name_prefix):]
+                raise CompileError(symbol.position, f"'{name}' has incomplete type '{symbol.type}'")
             symbol.initializer = Initializers(None).static_items(symbol.type, None, symbol.position)
     unit.symbols = [s for s in unit.symbols if s.used or s.klass != Symbol.EXTERNAL]
 

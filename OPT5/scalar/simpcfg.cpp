@@ -1,13 +1,295 @@
-// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
-// meaning, and what is not known is assumed not to hold.
+// The control-flow simplifier.
+//
+// One round visits the blocks from the last to the first, so that a branch is threaded over blocks whose own branches
+// are threaded already, and from the first to the last, so that a block takes over a whole chain of successors. A
+// change can make another one possible (a merged block holds a constant test, a dead block leaves its successor one
+// predecessor), so rounds go on until nothing changes; each change removes a block, an edge or a control statement, and
+// there are few rounds in practice. Control statements are cached by depth-first number, since a block's list must be
+// walked to find its last.
+
 #include "OPT5/scalar/simpcfg.h"
 
-void simpcfg(int, int) {}
-void optimize_SWITCH_cases() {}
-void rotate_loops() {}
-void straighten_traces_in_cfg() {}
-void straighten_cond_paths() {}
-void optimize_superblocks_in_cfg() {}
-void add_loop_annotation_from_profile() {}
-void initialize_CFG_profiling_annotation(int, int) {}
-void initialize_the_profiling_state(int) {}
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
+#include "UTIL/abort.h"
+
+namespace {
+
+constexpr int MAX_THREADING_ROUNDS = 20;
+
+// Where a block leads that holds nothing but a jump; null for any other block. The entry stays, since nothing may jump
+// to the block behind it in its place, and so does a block that jumps to itself.
+BBLK* bypass_of(const BBLK* bb) {
+    const LIST* only = bb->statements;
+    if (!only || only->rest || only->first->op != BRANCH || bb == currfuninfo->bb_list || bb->is_in_LIR_form())
+        return nullptr;
+    BBLK* target = only->first->left->lbl->bblock;
+    return target == bb ? nullptr : target;
+}
+
+void redirect(BBLK* bb, LIST* control, BBLK* from, BBLK* to) {
+    const EDGE* old = edge_memberp(from, bb->successors);
+    const double prob = old ? old->prob : -1.0;
+    subst_bb_for_bb_in_stmts(to, from, control);
+    disconnect(bb, from);
+    bb->successors = add_edge(to, bb->successors, prob);
+    to->predecessors = add_edge(bb, to->predecessors, prob);
+}
+
+// The block that a SWITCH on a constant reaches.
+BBLK* target_of_constant_switch(const NODE* sw) {
+    const INT65 value = sw->left->u.lval;
+    NODE* chosen = nullptr;
+    for (NODE* t = sw->right; t; t = t->op == COMMA ? t->left : nullptr) {
+        NODE* element = t->op == COMMA ? t->right : t;
+        if (element->op == DEFAULT) {
+            if (!chosen) chosen = element->left;
+        } else if (truncate_to_type(element->left->u.lval, sw->left->type) == value)
+            chosen = element->right;
+    }
+    return chosen ? chosen->lbl->bblock : nullptr;
+}
+
+// The one block that a control statement leads to whatever it computes, or null.
+BBLK* sole_target(NODE* control) {
+    BBLK* sole = nullptr;
+    bool several = false;
+    for_each_branch_target(control, [&](NODE* ref) {
+        if (sole && sole != ref->lbl->bblock) several = true;
+        sole = ref->lbl->bblock;
+    });
+    return several ? nullptr : sole;
+}
+
+BBLK* decided_target(NODE* control) {
+    if (control->op != IF && control->op != SWITCH) return nullptr;
+    if (tree_is_EH_SWITCH(control)) return nullptr;
+    if (BBLK* sole = sole_target(control)) return sole;
+    if (control->left->op != ICON) return nullptr;
+    if (control->op == SWITCH) return target_of_constant_switch(control);
+    NODE* targets = control->right;
+    return (control->left->u.lval.is_zero() ? targets->right : targets->left)->lbl->bblock;
+}
+
+class CFG_SIMPLIFIER {
+public:
+    bool run() {
+        collect();
+        bool changed = false;
+        for (bool again = true; again; changed |= again) {
+            again = false;
+            for (auto it = blocks.rbegin(); it != blocks.rend(); ++it)
+                if (is_live(*it)) again |= simplify_branch(*it);
+            for (BBLK* bb : blocks)
+                if (is_live(bb)) again |= take_over_successors(bb);
+        }
+        return changed;
+    }
+
+private:
+    void collect() {
+        BBLK* const entry = currfuninfo->bb_list;
+        controls.push_back(nullptr);
+        for (BBLK* bb = entry; bb; bb = bb->dflink) {
+            blocks.push_back(bb);
+            controls.push_back(bb->last_statement());
+            OPT_ASSERT(bb->dfn + 1 == static_cast<int>(controls.size()));
+        }
+        for (BBLK* bb : blocks)
+            if (bb != entry && !bb->predecessors) remove(bb);
+    }
+
+    LIST*& control_of(const BBLK* bb) { return controls[bb->dfn]; }
+    bool is_live(const BBLK* bb) { return control_of(bb) != nullptr; }
+
+    // A block without predecessors goes, and with it the successors whose last predecessor it was. The objects stay for
+    // `rebuildcfg`, which also finds the rings that nothing enters.
+    void remove(BBLK* bb) {
+        std::vector<BBLK*> work{bb};
+        while (!work.empty()) {
+            BBLK* dead = work.back();
+            work.pop_back();
+            if (!is_live(dead)) continue;
+            erase_tree_list(dead->statements);
+            dead->statements = control_of(dead) = nullptr;
+            while (dead->successors) {
+                BBLK* next = dead->successors->first;
+                disconnect(dead, next);
+                if (!next->predecessors && next != currfuninfo->bb_list) work.push_back(next);
+            }
+        }
+    }
+
+    void remove_if_unreached(BBLK* bb) {
+        if (!bb->predecessors && bb != currfuninfo->bb_list) remove(bb);
+    }
+
+    bool simplify_branch(BBLK* bb) {
+        if (bb->is_in_LIR_form()) return false;
+        bool changed = thread(bb);
+        LIST* control = control_of(bb);
+        if (BBLK* target = decided_target(control->first)) {
+            const std::vector<BBLK*> old = successors_of(bb);
+            make_branch(bb, control, target);
+            control_of(bb) = control->rest ? control->rest : control;
+            for (BBLK* s : old) remove_if_unreached(s);
+            changed = true;
+        }
+        return changed;
+    }
+
+    static std::vector<BBLK*> successors_of(const BBLK* bb) {
+        std::vector<BBLK*> list;
+        for (const EDGE* e = bb->successors; e; e = e->rest) list.push_back(e->first);
+        return list;
+    }
+
+    // Each successor that only jumps on gives way to the block that it jumps to.
+    bool thread(BBLK* bb) {
+        bool changed = false;
+        for (BBLK* via : successors_of(bb)) {
+            BBLK* target = via;
+            for (int round = 0; round < MAX_THREADING_ROUNDS; ++round) {
+                BBLK* next = bypass_of(target);
+                if (!next) break;
+                target = next;
+                if (target == via) break; // a ring of jumps
+            }
+            if (target == via) continue;
+            redirect(bb, control_of(bb), via, target);
+            remove_if_unreached(via);
+            changed = true;
+        }
+        return changed;
+    }
+
+    bool take_over_successors(BBLK* bb) {
+        bool changed = false;
+        while (BBLK* next = mergeable_successor(bb)) {
+            take_over(bb, next);
+            changed = true;
+        }
+        return changed;
+    }
+
+    BBLK* mergeable_successor(BBLK* bb) {
+        if (control_of(bb)->first->op != BRANCH || !bb->successors || bb->successors->rest || bb->is_in_LIR_form())
+            return nullptr;
+        BBLK* next = bb->successors->first;
+        if (next == bb || next == currfuninfo->bb_list || next->is_in_LIR_form()) return nullptr;
+        if (!next->predecessors || next->predecessors->rest) return nullptr;
+        return next;
+    }
+
+    // The BRANCH's cell becomes the first of the successor's statements.
+    void take_over(BBLK* bb, BBLK* next) {
+        LIST* cell = control_of(bb);
+        LIST* first = next->statements;
+        erase_tree(cell->first);
+        cell->first = first->first;
+        cell->psn = first->psn;
+        cell->flag1 = first->flag1;
+        cell->flag2 = first->flag2;
+        cell->rest = first->rest;
+        control_of(bb) = control_of(next) == first ? cell : control_of(next);
+        delete first;
+        next->statements = control_of(next) = nullptr;
+
+        disconnect(bb, next);
+        bb->successors = next->successors;
+        next->successors = nullptr;
+        for (EDGE* e = bb->successors; e; e = e->rest)
+            if (EDGE* back = edge_memberp(next, e->first->predecessors)) back->first = bb;
+        if (currfuninfo->exit_bb == next) currfuninfo->exit_bb = bb;
+        if (!bb->first_psn) bb->first_psn = next->first_psn;
+        if (next->last_psn) bb->last_psn = next->last_psn;
+        bb->dFreqOut = next->dFreqOut;
+    }
+
+    std::vector<BBLK*> blocks;
+    std::vector<LIST*> controls; // by dfn; null for a block that is gone
+};
+
+} // namespace
+
+void make_branch(BBLK* bb, LIST* control, BBLK* target) {
+    NODE* tree = control->first;
+    LS* ls = tree->ls;
+    NODE* effects = peel_for_effect(tree->left);
+    tree->left = nullptr;
+    erase_tree(tree);
+    control->first = mk_BRANCH(target, ls);
+    if (effects) {
+        // The cell is the block's last: the effects take it, and the branch gets a new one behind.
+        control->rest = mkelist(control->first, nullptr, control->psn);
+        control->first = effects;
+    }
+    for (EDGE* e = bb->successors; e;) {
+        BBLK* old = e->first;
+        e = e->rest;
+        if (old != target) disconnect(bb, old);
+    }
+    connect(bb, target);
+}
+
+bool resync_edges(BBLK* bb) {
+    NODE* control = bb->branch();
+    if (!control || bb->is_in_LIR_form()) return false;
+    EDGE* targets = list_branch_targets(control, nullptr);
+    bool changed = false;
+    for (EDGE* e = bb->successors; e;) {
+        BBLK* old = e->first;
+        e = e->rest;
+        if (edge_memberp(old, targets)) continue;
+        disconnect(bb, old);
+        changed = true;
+    }
+    if (edge_length(targets) != edge_length(bb->successors)) {
+        for (EDGE* e = targets; e; e = e->rest) connect(bb, e->first);
+        changed = true;
+    }
+    erase_edge_list(targets);
+    return changed;
+}
+
+void simpcfg(bool quest_is_ok, bool) {
+    FUNINFO* f = currfuninfo;
+    if (!f || !f->bb_list) return;
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'simpcfg' ----------\n");
+    OPT_ASSERT(quest_is_ok || currfuninfo->bb_list->loop == NULL);
+    renumber_bblocks();
+    bool changed = false;
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) changed |= resync_edges(bb);
+    for (bool again = true; again; changed |= again) {
+        again = false;
+        if (quest_is_ok && f->profile_status == 0) again |= cross_jump();
+        again |= CFG_SIMPLIFIER().run();
+        again |= remove_redundant_tests();
+        if (quest_is_ok) again |= join_diamonds();
+        if (again) rebuildcfg();
+    }
+    if (changed) rebuildcfg();
+}
+
+BBLK* split_block(BBLK* bb, LIST* cell, bool renumber) {
+    LIST* behind = cell->rest;
+    OPT_ASSERT(behind != nullptr);
+    BBLK* next = insert_new_bb(-1, bb, behind);
+    cell->rest = mkelist(mk_BRANCH(next), nullptr, cell->psn);
+    next->first_psn = behind->psn;
+    next->last_psn = bb->last_psn;
+    next->dFreqIn = next->dFreqOut = bb->dFreqOut;
+    next->loop = bb->loop;
+    next->successors = bb->successors;
+    bb->successors = nullptr;
+    for (EDGE* e = next->successors; e; e = e->rest)
+        if (EDGE* back = edge_memberp(bb, e->first->predecessors)) back->first = next;
+    if (bb->owner()->exit_bb == bb) bb->owner()->exit_bb = next;
+    connect(bb, next);
+    if (renumber) renumber_bblocks();
+    return next;
+}

@@ -1,10 +1,28 @@
 // The control-flow simplifier, and the passes that shape the graph: cases, rotation, traces, superblocks, profile.
 #pragma once
 
-// Removes unreachable and empty blocks, joins blocks, simplifies branches; `last` is set ahead of the output.
-void simpcfg(int last, int keep_loops);
+#include <cstdio>
+#include <vector>
+
+class BBLK;
+class NODE;
+class PSN;
+struct LIST;
+
+// Keeps the graph small: decided and pointless branches, jumps to jumps, straight-line blocks, tests that an earlier
+// one decides, unreachable blocks. With `quest_is_ok`, ahead of the output, also shared tails and diamonds that become
+// selects. A loop hierarchy must be gone unless `quest_is_ok` is set. `keep_loops` is given by all callers as 0.
+void simpcfg(bool quest_is_ok, bool keep_loops);
+
+// The statements behind `cell` go to a new block that follows; the first block then ends in a BRANCH to it. The new
+// block, which takes over the successors. With `renumber` the depth-first numbers are valid afterwards.
+BBLK* split_block(BBLK* bb, LIST* cell, bool renumber);
+
+// Blocks that end the function in the same statements become one; the others jump there.
+void do_early_cross_jumping();
 
 void optimize_SWITCH_cases();
+// Lays the block of a loop's test behind the loop's body, so that one conditional branch closes the loop.
 void rotate_loops();
 void straighten_traces_in_cfg();
 void straighten_cond_paths();
@@ -14,3 +32,14 @@ void optimize_superblocks_in_cfg();
 void add_loop_annotation_from_profile();
 void initialize_CFG_profiling_annotation(int keep, int exact);
 void initialize_the_profiling_state(int status);
+
+// ---- Used between the files of the control-flow simplifier. Each returns whether it changed the graph, and leaves
+// unreachable blocks to `rebuildcfg`.
+
+// The control statement of `bb` becomes a BRANCH to `target`; what it computed stays for its effects.
+void make_branch(BBLK* bb, LIST* control, BBLK* target);
+// Drops the edges that the control statement no longer names, and adds those that it does.
+bool resync_edges(BBLK* bb);
+bool remove_redundant_tests();
+bool cross_jump();
+bool join_diamonds();

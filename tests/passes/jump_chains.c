@@ -2,12 +2,15 @@
 // RUN: --opt_level=1
 #include <zrun.h>
 
+int g;
+
 // FUNCTION: chain
 // COUNT 1: goto
 // COUNT 1: /^L\d+:/
 // HAS: return 0
 int chain(int x) {
     if (x > 3) goto first;
+    g = x;
     return 0;
 first:
     goto second;

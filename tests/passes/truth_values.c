@@ -11,11 +11,14 @@ int ordered(int x) { return !(x < 3); }
 // HAS: /return \w+ != 0/
 int twice(int x) { return !!x; }
 
+int g;
+
 // FUNCTION: branch
 // COUNT 0: /!!|! !/
 // COUNT 1: if (
 int branch(int x) {
     if (!!(x == 4)) return 1;
+    g = x;
     return 2;
 }
 

@@ -1,0 +1,229 @@
+// Small diamonds become selects.
+//
+// `if (c) x = a; else x = b;` and `return c ? a : b` in two blocks cost two jumps; as one statement the code generator
+// may use a conditional instruction, or the target's minimum and maximum. It may then compute both arms, so neither may
+// have a side effect or need the condition as its guard. The condition is evaluated first as before.
+
+#include "OPT5/scalar/simpcfg.h"
+
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
+
+#include <utility>
+
+namespace {
+
+constexpr int MAX_ARM_NODES = 8; // both arms are computed: they have to be cheap
+
+// An access through a pointer, a division and a call are only safe, or only worth it, where the condition holds.
+bool rhs_may_need_guard_in_lhs(NODE* rhs) {
+    bool guard = false;
+    for_each_node(rhs, [&](const NODE* t) {
+        switch (t->op) {
+        case UMULT:
+        case STREF:
+        case DIV:
+        case MOD:
+        case CALL:
+        case UCALL:
+        case ICALL:
+        case UICALL:
+        case MCALL:
+        case UMCALL:
+        case QUEST: guard = true; break;
+        default: break;
+        }
+    });
+    return guard;
+}
+
+bool is_plain_arm(NODE* value) {
+    return count_nodes_in_tree(value) <= MAX_ARM_NODES && !tree_has_side_effects(value) &&
+           !rhs_may_need_guard_in_lhs(value);
+}
+
+bool is_plain_target(const NODE* lvalue) {
+    return lvalue->op == NAME && lvalue->type->is_scalar() && !lvalue_is_volatile(lvalue);
+}
+
+// ---- Minimum and maximum
+
+const char* minmax_name(TYPE* type, bool maximum) {
+    if (type->is_float()) {
+        static const char* const names[3][2] = {{"FMIN", "FMAX"}, {"DMIN", "DMAX"}, {"LDMIN", "LDMAX"}};
+        const int row = type->fkind() == TYPE::fk_float ? 0 : type->fkind() == TYPE::fk_double ? 1 : 2;
+        return names[row][maximum];
+    }
+    static const char* const names[3][2][2] = {{{"MIN", "MAX"}, {"MINU", "MAXU"}},
+                                               {{"LMIN", "LMAX"}, {"LMINU", "LMAXU"}},
+                                               {{"LLMIN", "LLMAX"}, {"LLMINU", "LLMAXU"}}};
+    if (!type->is_int()) return nullptr;
+    const int row = type->size == 16 ? 0 : type->size == 32 ? 1 : type->size == 64 ? 2 : -1;
+    return row < 0 ? nullptr : names[row][type->is_unsigned()][maximum];
+}
+
+// Whether a compare holds where its left side is the smaller (1) or the larger (0); -1 for any other. Of floats only
+// the strict compares, which an equal pair and a NaN fail.
+int order_of(int op, TYPE* type) {
+    switch (op) {
+    case FLT: return 1;
+    case FGT: return 0;
+    case LT:
+    case LE: return type->is_unsigned() ? -1 : 1;
+    case GT:
+    case GE: return type->is_unsigned() ? -1 : 0;
+    case ULT:
+    case ULE: return type->is_unsigned() ? 1 : -1;
+    case UGT:
+    case UGE: return type->is_unsigned() ? 0 : -1;
+    default: return -1;
+    }
+}
+
+// The call of the target's built-in for `c ? a : b` where c compares a with b, or null. Of a floating pair the second
+// argument is the one that must be smaller (larger) to win, so that a NaN and zeros of both signs choose as before.
+NODE* make_minmax(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
+    if (!c->left || !c->right || !equiv_mtypes(c->left->type, type) || !equiv_mtypes(c->right->type, type))
+        return nullptr;
+    int op = c->op;
+    if (op == FGEN || op == FLEN) {
+        op = boolean_inv[op];
+        std::swap(a, b);
+    }
+    const int less = order_of(op, type);
+    if (less < 0) return nullptr;
+    const bool straight = trees_are_congruent(a, c->left, false) && trees_are_congruent(b, c->right, false);
+    const bool crossed = trees_are_congruent(a, c->right, false) && trees_are_congruent(b, c->left, false);
+    if (!straight && !crossed) return nullptr;
+    const bool maximum = (less == 1) == crossed;
+    const char* generic = minmax_name(type, maximum);
+    const BIF* bif = generic ? find_target_BIF_descriptor(generic) : nullptr;
+    if (!bif) return nullptr;
+    // The winner on the condition's side comes second.
+    NODE* args = maketree(COMMA, copy_tree(b), copy_tree(a), tp->int_t);
+    return fix_BIF_types(mk_ICALL(bif->name.c_str(), args, type));
+}
+
+bool is_truth_value(const NODE* t, long value) {
+    return t->op == ICON && t->type->is_int() && t->u.lval == INT65(value);
+}
+
+// `c ? a : b` as a value of `type`; null where it is better left alone. Consumes nothing.
+NODE* make_select(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
+    if (type->is_int() && is_truth_value(a, 1) && is_truth_value(b, 0))
+        return coerce_to_type(type, make_boolean(copy_tree(c), nullptr));
+    if (type->is_int() && is_truth_value(a, 0) && is_truth_value(b, 1))
+        return coerce_to_type(type, invert_boolean_tree(copy_tree(c)));
+    if (NODE* call = make_minmax(c, a, b, type)) return call;
+    NODE* arms = maketree(COLON, coerce_to_type(type, copy_tree(a)), coerce_to_type(type, copy_tree(b)), type);
+    return simp_node(maketree(QUEST, copy_tree(c), arms, type), nullptr);
+}
+
+// ---- Shapes
+
+BBLK* arm_of(const NODE* ref, const BBLK* bb) {
+    BBLK* arm = ref->lbl->bblock;
+    const EDGE* e = arm->predecessors;
+    return arm != bb && e && !e->rest && !arm->is_in_LIR_form() ? arm : nullptr;
+}
+
+// The one assignment of a block that then jumps on.
+NODE* sole_assignment(const BBLK* arm) {
+    const LIST* s = arm->statements;
+    if (!s || !s->rest || s->rest->rest || s->first->op != ASG || s->rest->first->op != BRANCH) return nullptr;
+    if (tree_is_arg_prolog(s->first) || !is_plain_target(s->first->left) || !is_plain_arm(s->first->right))
+        return nullptr;
+    return s->first;
+}
+
+NODE* sole_return(const BBLK* arm) {
+    const LIST* s = arm->statements;
+    if (!s || s->rest || s->first->op != RETURN || !s->first->right || !s->first->right->type->is_scalar())
+        return nullptr;
+    return is_plain_arm(s->first->right) ? s->first : nullptr;
+}
+
+BBLK* sole_successor(const BBLK* bb) {
+    return bb->successors && !bb->successors->rest ? bb->successors->first : nullptr;
+}
+
+void drop_arm(BBLK* bb, BBLK* arm) {
+    disconnect(bb, arm);
+    while (arm->successors) disconnect(arm, arm->successors->first);
+}
+
+// The test gives way to `statement` and a jump to `join`, or to `statement` alone.
+void replace_test(BBLK* bb, LIST* test, NODE* statement, BBLK* join) {
+    LS* ls = test->first->ls;
+    erase_tree(test->first);
+    test->first = statement;
+    if (!join) return;
+    test->rest = mkelist(mk_BRANCH(join, ls), nullptr, test->psn);
+    connect(bb, join);
+}
+
+bool join_assignments(BBLK* bb, LIST* test, BBLK* on_true, BBLK* on_false) {
+    NODE *a = sole_assignment(on_true), *b = sole_assignment(on_false);
+    BBLK* join = sole_successor(on_true);
+    if (!a || !b || !join || join != sole_successor(on_false) || join == on_true || join == on_false) return false;
+    if (!trees_are_congruent(a->left, b->left, false)) return false;
+    NODE* value = make_select(test->first->left, a->right, b->right, a->left->type);
+    NODE* statement = mk_ASG(copy_tree(a->left), value);
+    drop_arm(bb, on_true);
+    drop_arm(bb, on_false);
+    replace_test(bb, test, statement, join);
+    return true;
+}
+
+bool join_returns(BBLK* bb, LIST* test, BBLK* on_true, BBLK* on_false) {
+    NODE *a = sole_return(on_true), *b = sole_return(on_false);
+    if (!a || !b || !equiv_mtypes(a->right->type, b->right->type)) return false;
+    NODE* value = make_select(test->first->left, a->right, b->right, a->right->type);
+    NODE* statement = maketree(RETURN, copy_tree(a->left), value, a->type, a->ls);
+    drop_arm(bb, on_true);
+    drop_arm(bb, on_false);
+    replace_test(bb, test, statement, nullptr);
+    return true;
+}
+
+// `if (a < x) x = a;`: one arm is empty, which pays where the target has the instruction.
+bool join_extremum(BBLK* bb, LIST* test, BBLK* arm, BBLK* join, bool holds) {
+    if (!arm || arm == join || sole_successor(arm) != join) return false;
+    NODE* asg = sole_assignment(arm);
+    if (!asg) return false;
+    NODE* condition = test->first->left;
+    if (tree_has_side_effects(condition)) return false;
+    const NODE *a = asg->right, *b = asg->left;
+    NODE* value = make_minmax(condition, holds ? a : b, holds ? b : a, asg->left->type);
+    if (!value) return false;
+    NODE* statement = mk_ASG(copy_tree(asg->left), value);
+    drop_arm(bb, arm);
+    disconnect(bb, join);
+    replace_test(bb, test, statement, join);
+    return true;
+}
+
+bool join_diamond(BBLK* bb) {
+    LIST* test = bb->last_statement();
+    if (!test || test->first->op != IF || test->first->left->op == ENDLOOP || bb->is_in_LIR_form()) return false;
+    const NODE* targets = test->first->right;
+    BBLK *on_true = arm_of(targets->left, bb), *on_false = arm_of(targets->right, bb);
+    if (on_true && on_false && on_true != on_false)
+        if (join_assignments(bb, test, on_true, on_false) || join_returns(bb, test, on_true, on_false)) return true;
+    return join_extremum(bb, test, on_true, targets->right->lbl->bblock, true) ||
+           join_extremum(bb, test, on_false, targets->left->lbl->bblock, false);
+}
+
+} // namespace
+
+bool join_diamonds() {
+    if (opt_level() == 0) return false;
+    bool changed = false;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (bb->statements) changed |= join_diamond(bb);
+    return changed;
+}

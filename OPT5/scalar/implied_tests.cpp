@@ -1,0 +1,316 @@
+// Tests that an earlier one decides.
+//
+// A condition q at the end of a block is decided on the way from an earlier IF on p if the way's side of p implies q or
+// its opposite, and nothing between the two tests changes what q reads. Where every way into the block is known, the
+// test goes; where a block is nothing but the test, a single way into it is led around it.
+
+#include "OPT5/scalar/simpcfg.h"
+
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/implied_tests.h"
+
+#include <algorithm>
+#include <optional>
+
+namespace {
+
+constexpr int MAX_BLOCKS_BACK = 8;
+constexpr int MAX_STATEMENTS_BACK = 64;
+constexpr int MAX_NODES = 32; // of a condition: larger ones are seldom repeated and dear to compare
+
+// ---- What a condition reads
+
+struct READS {
+    std::vector<const SYMTAB*> symbols;
+    bool indirect = false; // through pointers
+    bool exposed = false;  // a symbol that a pointer or a call may reach
+    bool supported = true;
+};
+
+bool is_exposed(const SYMTAB* sym) { return sym->level == 0 || sym->is_aliased() || currfuninfo->address_taken_local; }
+
+READS reads_of(NODE* condition) {
+    READS reads;
+    for_each_node(condition, [&](const NODE* t) {
+        switch (t->op) {
+        case NAME:
+            if (!t->u.sym || t->u.sym->is_function()) break;
+            reads.symbols.push_back(t->u.sym);
+            reads.exposed |= is_exposed(t->u.sym);
+            break;
+        case UMULT:
+        case STREF: reads.indirect = true; break;
+        case ICALL:
+        case UICALL:
+        case MCALL:
+        case UMCALL:
+        case CALL:
+        case UCALL:
+        case ASM:
+        case UAND: reads.supported = false; break;
+        default: break;
+        }
+    });
+    return reads;
+}
+
+bool names_one_of(const NODE* lvalue, const std::vector<const SYMTAB*>& symbols) {
+    return std::find(symbols.begin(), symbols.end(), lvalue->u.sym) != symbols.end();
+}
+
+bool store_may_change(const NODE* lvalue, const READS& reads) {
+    while (lvalue->op == STDOT) lvalue = lvalue->left;
+    if (lvalue->op != NAME) return reads.indirect || reads.exposed;
+    if (names_one_of(lvalue, reads.symbols)) return true;
+    return reads.indirect && is_exposed(lvalue->u.sym);
+}
+
+bool statement_may_change(NODE* statement, const READS& reads) {
+    bool changes = false;
+    for_each_node(statement, [&](const NODE* t) {
+        switch (t->op) {
+        case CALL:
+        case UCALL:
+        case ICALL:
+        case UICALL:
+        case MEMCPY: changes |= reads.indirect || reads.exposed; break;
+        case MCALL:
+        case UMCALL: changes |= reads.indirect || reads.exposed; break;
+        case ASM: changes |= !tree_is_ASM_comment(t); break;
+        case ARGREF: changes |= store_may_change(t->left, reads); break;
+        default:
+            if (side_effects[t->op] == 1) changes |= store_may_change(t->left, reads);
+            break;
+        }
+    });
+    return changes;
+}
+
+// ---- Implication
+
+// A truth value without the operators that only pass it on or negate it.
+const NODE* bare_condition(const NODE* t, bool* negated) {
+    for (;;) {
+        if (t->op == EXCLAIM) {
+            *negated = !*negated;
+            t = t->left;
+        } else if ((t->op == EQ || t->op == NEQ) && t->right->op == ICON && t->right->u.lval.is_zero() &&
+                   !t->left->type->is_pointer() &&
+                   (op_is_int_compare(t->left->op) || op_is_float_compare(t->left->op) || t->left->op == EXCLAIM)) {
+            *negated ^= t->op == EQ;
+            t = t->left;
+        } else
+            return t;
+    }
+}
+
+// The integers x for which a compare of x with a constant holds: [low, high], or all but those.
+struct RANGE {
+    const NODE* variable;
+    INT65 low, high;
+    bool outside = false;
+};
+
+std::optional<RANGE> range_of(const NODE* t) {
+    RANGE r;
+    if (t->type && t->op != EQ && !op_is_int_compare(t->op)) {
+        if (!t->type->is_int() || tree_has_side_effects(t)) return std::nullopt;
+        return RANGE{t, INT65(0), INT65(0), true}; // the value itself: any but zero
+    }
+    if (t->right->op != ICON || !t->left->type->is_int()) return std::nullopt;
+    r.variable = t->left;
+    const INT65 c = t->right->u.lval;
+    const bool is_unsigned = t->left->type->is_unsigned();
+    r.low = int_type_min(t->left->type);
+    r.high = int_type_max(t->left->type);
+    if (c < r.low || c > r.high) return std::nullopt;
+    const bool unsigned_op = t->op == ULT || t->op == ULE || t->op == UGE || t->op == UGT;
+    if (t->op != EQ && t->op != NEQ && unsigned_op != is_unsigned) return std::nullopt;
+    switch (t->op) {
+    case EQ: r.low = r.high = c; break;
+    case NEQ:
+        r.low = r.high = c;
+        r.outside = true;
+        break;
+    case LT:
+    case ULT: r.high = c - INT65(1); break;
+    case LE:
+    case ULE: r.high = c; break;
+    case GT:
+    case UGT: r.low = c + INT65(1); break;
+    case GE:
+    case UGE: r.low = c; break;
+    default: return std::nullopt;
+    }
+    return r;
+}
+
+bool is_empty(const RANGE& r) { return r.high < r.low; }
+
+// Whether no value lies in both.
+bool disjoint(const RANGE& a, const RANGE& b) {
+    if (a.outside && b.outside) return false;
+    if (a.outside) return disjoint(b, a);
+    if (is_empty(a)) return true;
+    if (b.outside) return b.low <= a.low && a.high <= b.high;
+    return is_empty(b) || a.high < b.low || b.high < a.low;
+}
+
+// One that touches a limit of the type has an interval as its complement.
+RANGE complement(RANGE r) {
+    const INT65 min = int_type_min(r.variable->type), max = int_type_max(r.variable->type);
+    if (r.outside)
+        r.outside = false;
+    else if (is_empty(r))
+        r.low = min, r.high = max;
+    else if (r.low == min)
+        r.low = r.high + INT65(1), r.high = max;
+    else if (r.high == max)
+        r.high = r.low - INT65(1), r.low = min;
+    else
+        r.outside = true;
+    return r;
+}
+
+std::optional<bool> range_implies(const NODE* p, bool sense, const NODE* q) {
+    std::optional<RANGE> a = range_of(p), b = range_of(q);
+    if (!a || !b || !trees_are_congruent(a->variable, b->variable, false)) return std::nullopt;
+    if (a->variable->type->size != b->variable->type->size ||
+        a->variable->type->is_unsigned() != b->variable->type->is_unsigned())
+        return std::nullopt;
+    if (!sense) a = complement(*a);
+    if (disjoint(*a, *b)) return false;
+    if (disjoint(*a, complement(*b))) return true;
+    return std::nullopt;
+}
+
+std::optional<bool> implied(const NODE* p, bool sense, const NODE* q);
+
+std::optional<bool> implied_by_parts(const NODE* p, bool sense, const NODE* q) {
+    if (p->op != (sense ? ANDAND : OROR)) return std::nullopt;
+    if (auto known = implied(p->left, sense, q)) return known;
+    return implied(p->right, sense, q);
+}
+
+std::optional<bool> implied_parts(const NODE* p, bool sense, const NODE* q) {
+    if (q->op != ANDAND && q->op != OROR) return std::nullopt;
+    const bool dominant = q->op == OROR; // the value of one part that settles the whole
+    auto left = implied(p, sense, q->left), right = implied(p, sense, q->right);
+    if ((left && *left == dominant) || (right && *right == dominant)) return dominant;
+    if (left && right) return !dominant;
+    return std::nullopt;
+}
+
+std::optional<bool> implied(const NODE* p, bool sense, const NODE* q) {
+    bool p_negated = false, q_negated = false;
+    p = bare_condition(p, &p_negated);
+    q = bare_condition(q, &q_negated);
+    sense ^= p_negated;
+    std::optional<bool> known;
+    if (bools_are_congruent(p, q, false, false))
+        known = sense;
+    else if (bools_are_congruent(p, q, true, false))
+        known = !sense;
+    if (!known) known = implied_by_parts(p, sense, q);
+    if (!known) known = implied_parts(p, sense, q);
+    if (!known) known = range_implies(p, sense, q);
+    if (!known) return known;
+    return *known != q_negated;
+}
+
+// ---- The way back
+
+bool block_may_change(const BBLK* bb, const READS& reads, int* budget) {
+    for (const LIST* s = bb->statements; s && s->rest; s = s->rest) // the control statement is looked at apart
+        if (--*budget < 0 || statement_may_change(s->first, reads)) return true;
+    return false;
+}
+
+// What the way from `pred` to `bb` says of `q`, back along sole predecessors.
+std::optional<bool> outcome_on_edge(const BBLK* pred, const BBLK* bb, const NODE* q, const READS& reads) {
+    int budget = MAX_STATEMENTS_BACK;
+    for (int blocks = 0; blocks < MAX_BLOCKS_BACK; ++blocks) {
+        NODE* control = pred->branch();
+        if (!control || pred->is_in_LIR_form()) return std::nullopt;
+        if (control->op == IF && control->left->op != ENDLOOP) {
+            const BBLK* on_true = control->right->left->lbl->bblock;
+            const BBLK* on_false = control->right->right->lbl->bblock;
+            if (on_true != on_false && !tree_has_side_effects(control->left)) {
+                int outcome = pred_implies_pred(control->left, on_true == bb, q);
+                if (outcome >= 0) return outcome != 0;
+            }
+        } else if (control->op != BRANCH && control->op != SWITCH)
+            return std::nullopt;
+        if (statement_may_change(control->left, reads) || block_may_change(pred, reads, &budget)) return std::nullopt;
+        if (!pred->predecessors || pred->predecessors->rest) return std::nullopt;
+        bb = pred;
+        pred = pred->predecessors->first;
+    }
+    return std::nullopt;
+}
+
+// A loop's test is left where it is: a way around it would enter the loop in its middle.
+bool has_back_edge(const BBLK* bb) {
+    for (const EDGE* e = bb->predecessors; e; e = e->rest)
+        if (e->first->dfn >= bb->dfn) return true;
+    return false;
+}
+
+void lead_around(BBLK* pred, BBLK* bb, BBLK* target) {
+    subst_bb_for_bb_in_bb(target, bb, pred);
+    disconnect(pred, bb);
+    connect(pred, target);
+}
+
+bool remove_redundant_test(BBLK* bb) {
+    LIST* last = bb->last_statement();
+    NODE* control = last->first;
+    if (control->op != IF || control->left->op == ENDLOOP || !bb->predecessors) return false;
+    NODE* q = control->left;
+    if (count_nodes_in_tree(q) > MAX_NODES || tree_has_side_effects(q)) return false;
+    const READS reads = reads_of(q);
+    if (!reads.supported) return false;
+    int budget = MAX_STATEMENTS_BACK;
+    if (block_may_change(bb, reads, &budget)) return false;
+    BBLK* targets[2] = {control->right->right->lbl->bblock, control->right->left->lbl->bblock};
+
+    std::vector<std::pair<BBLK*, bool>> known;
+    bool all = true;
+    int predecessors = 0;
+    for (const EDGE* e = bb->predecessors; e; e = e->rest) {
+        if (++predecessors > MAX_BLOCKS_BACK) return false;
+        auto outcome = outcome_on_edge(e->first, bb, q, reads);
+        if (!outcome) {
+            all = false;
+            continue;
+        }
+        known.emplace_back(e->first, *outcome);
+        all &= known.front().second == *outcome;
+    }
+    if (known.empty()) return false;
+    if (all) {
+        make_branch(bb, last, targets[known.front().second]);
+        return true;
+    }
+    if (last != bb->statements || has_back_edge(bb)) return false;
+    for (auto [pred, outcome] : known) lead_around(pred, bb, targets[outcome]);
+    return true;
+}
+
+} // namespace
+
+int pred_implies_pred(const NODE* p, bool sense, const NODE* q) {
+    auto known = implied(p, sense, q);
+    return known ? *known : -1;
+}
+
+bool remove_redundant_tests() {
+    if (opt_level() < 2) return false;
+    bool changed = false;
+    for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
+        if (bb->statements && !bb->is_in_LIR_form()) changed |= remove_redundant_test(bb);
+    return changed;
+}

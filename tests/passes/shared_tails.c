@@ -1,0 +1,38 @@
+// Blocks that end the function alike are written once.
+// RUN: --opt_level=2
+#include <zrun.h>
+
+int g, h;
+
+// FUNCTION: tails
+// COUNT 1: _h = 
+// COUNT 1: /return .*\* 3/
+int tails(int x) {
+    switch (x) {
+    case 1: h = x + 1; return g * 3;
+    case 9: h = x + 1; return g * 3;
+    case 70: g = 7; break;
+    default: g = 8;
+    }
+    h = x + 1;
+    return g * 3;
+}
+
+// FUNCTION: unlike
+// COUNT 2: _h = 
+int unlike(int x) {
+    if (x) { g = 5; h = x + 1; return g * 3; }
+    g = 5;
+    h = x + 2;
+    return g * 3;
+}
+
+int main(void) {
+    put_i16(tails(1) + h);
+    put_i16(tails(9) + h);
+    put_i16(tails(70) + h);
+    put_i16(tails(2) + h);
+    put_i16(unlike(1) + h);
+    put_i16(unlike(0) + h);
+    return 0;
+}

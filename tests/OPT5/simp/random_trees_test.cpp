@@ -1,0 +1,139 @@
+// Random trees and exhaustive small ones through the simplifier: values and side effects stay.
+
+#include "tools/treecheck/campaign.h"
+
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/simp.h"
+
+#include <gtest/gtest.h>
+
+using namespace treecheck;
+
+namespace {
+
+OUTCOME run(const CAMPAIGN& c) {
+    return run_campaign(c, [](const FINDING& f, uint64_t seed) {
+        ADD_FAILURE() << "seed " << seed << " " << f.what << "\n  tree   " << f.before << "\n  result " << f.after
+                      << "\n  with   " << f.contents;
+    });
+}
+
+TEST(RandomTrees, KeepValuesAndEffects) {
+    CAMPAIGN c;
+    c.seed = 1000000;
+    c.count = 85000;
+    c.assignments = 10;
+    EXPECT_GT(run(c).runs, c.count * 8) << "most trees do something defined";
+}
+
+TEST(RandomTrees, DeepOnesKeepValuesAndEffects) {
+    CAMPAIGN c;
+    c.seed = 2000000;
+    c.count = 15000;
+    c.assignments = 10;
+    c.trees.depth = 7;
+    run(c);
+}
+
+// ---- Every operator on every pair of boundary values
+
+std::vector<INT65> boundaries(TYPE* t) {
+    if (t->is_bool()) return {0, 1};
+    const INT65 min = int_type_min(t), max = int_type_max(t);
+    std::vector<INT65> out;
+    for (INT65 v : {INT65(0), INT65(1), INT65(2), INT65(-1), min, max, max - INT65(1), (max >> INT65(1)) + INT65(1)})
+        out.push_back(truncate_to_type(v, t));
+    return out;
+}
+
+NODE* constant(INT65 v, TYPE* t) {
+    NODE* n = mk_ICON(INT65(0), t);
+    n->u.lval = v;
+    return n;
+}
+
+void expect_kept(NODE* t) {
+    for (const OPERATION& op : operations) {
+        const FINDING f = TRIAL(t, 1, 8).check(op);
+        EXPECT_FALSE(f) << f.what << "\n  tree   " << f.before << "\n  result " << f.after << "\n  with   "
+                        << f.contents;
+    }
+    erase_tree(t);
+}
+
+// Both operands constant; one a variable that holds the boundary values; and each under a cast to every type.
+TEST(RandomTrees, OperatorsOnBoundaries) {
+    const WORLD& w = world();
+    const int ops[] = {PLUS, MINUS, MULT, DIV, MOD, ANDB, ORB, XORB, SLL, SRL, EQ, NEQ, LE, LT, GE, GT};
+    for (SYMTAB* x : w.integers) {
+        TYPE* type = x->type;
+        if (promoted_type(type) != type) continue;
+        for (int op : ops)
+            for (INT65 a : boundaries(type)) {
+                const bool is_shift = op == SLL || op == SRL, compares = op_is_int_compare(op);
+                const int own = op >= LE && compares && type->is_unsigned() ? op + (ULE - LE) : op;
+                TYPE* result = compares ? tp->int_t : type;
+                auto right = [&](INT65 b) {
+                    return is_shift ? constant(INT65(b.value & (type->size - 1)), tp->int_t) : constant(b, type);
+                };
+                for (INT65 b : boundaries(type)) expect_kept(maketree(own, constant(a, type), right(b), result));
+                expect_kept(maketree(own, mk_NAME(x), right(a), result));
+                if (!is_shift) expect_kept(maketree(own, constant(a, type), mk_NAME(x), result));
+            }
+    }
+}
+
+TEST(RandomTrees, CastsOfBoundaries) {
+    const WORLD& w = world();
+    for (SYMTAB* x : w.integers)
+        for (TYPE* middle : w.integer_types)
+            for (TYPE* to : w.integer_types) {
+                for (INT65 v : boundaries(x->type))
+                    expect_kept(maketree(SCONV, maketree(SCONV, constant(v, x->type), nullptr, middle), nullptr, to));
+                expect_kept(maketree(SCONV, maketree(SCONV, mk_NAME(x), nullptr, middle), nullptr, to));
+            }
+}
+
+// The checker itself: what is wrong is seen.
+TEST(RandomTrees, FaultsAreFound) {
+    const WORLD& w = world();
+    NODE* sum =
+        maketree(PLUS, mk_NAME(w.integers[0]),
+                 maketree(UCALL, maketree(UAND, mk_NAME(w.functions[0]), nullptr, tp->mk_ptr(w.functions[0]->type)),
+                          nullptr, tp->int_t),
+                 tp->int_t);
+    const OPERATION faults[] = {
+        {"value", nullptr, [](NODE* t) { return maketree(PLUS, t, mk_ICON(INT65(1), tp->int_t), tp->int_t); }, nullptr,
+         true},
+        {"type", nullptr, [](NODE* t) { return maketree(SCONV, t, nullptr, tp->uint_t); }, nullptr, true},
+        {"effect lost", nullptr,
+         [](NODE* t) {
+             erase_tree(t);
+             return mk_ICON(INT65(0), tp->int_t);
+         },
+         nullptr, false},
+        {"effect twice", nullptr, [](NODE* t) { return mk_COMMAOP(copy_tree(t), t); }, nullptr, false},
+        {"a store", nullptr,
+         [](NODE* t) { return mk_COMMAOP(mk_ASG(mk_NAME(world().integers[2]), mk_ICON(INT65(77), tp->uint_t)), t); },
+         nullptr, true},
+        {"undefined", nullptr, [](NODE* t) { return maketree(DIV, t, mk_ICON(INT65(0), tp->int_t), tp->int_t); },
+         nullptr, true},
+    };
+    const TRIAL whole(sum, 5, 12);
+    for (const OPERATION& op : faults) EXPECT_TRUE(whole.check(op)) << op.name;
+    EXPECT_FALSE(whole.check({"same", nullptr, [](NODE* t) { return t; }, nullptr, true}));
+    erase_tree(sum);
+}
+
+TEST(RandomTrees, FindingsAreCutDown) {
+    GENERATOR make(77, {});
+    NODE* big = make.value(tp->int_t, 6);
+    big = maketree(PLUS, maketree(MULT, big, mk_NAME(world().integers[0]), tp->int_t), make.value(tp->int_t, 5),
+                   tp->int_t);
+    NODE* small = shrink(big, [](const NODE* t) { return tree_contains_op(t, MULT); });
+    EXPECT_EQ(count_nodes_in_tree(small), 3) << tree_to_infix(small);
+    erase_tree(small);
+}
+
+} // namespace

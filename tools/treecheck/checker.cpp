@@ -1,0 +1,217 @@
+#include "tools/treecheck/checker.h"
+
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/simp.h"
+
+#include <cstring>
+#include <set>
+
+namespace treecheck {
+
+// ---- Operations
+namespace {
+
+bool is_scalar(const NODE* t) { return form_of(t->type).bits != 0; }
+bool is_no_assignment(const NODE* t) { return !opcode_is_ASG(t->op); }
+
+bool is_true(BITS v, const FORM& f) { return f.is_float ? as_double(v) != 0 : v != 0; }
+bool same_truth(BITS expected, const FORM& before, BITS value, const FORM& after) {
+    return is_true(expected, before) == is_true(value, after);
+}
+bool is_int(const FORM& f) { return !f.is_float && !f.is_pointer && !f.is_bool && f.bits == 16 && f.is_signed; }
+bool truth_as_int(BITS expected, const FORM& before, BITS value, const FORM& after) {
+    return is_int(after) && value == (is_true(expected, before) ? 1 : 0);
+}
+bool opposite_as_int(BITS expected, const FORM& before, BITS value, const FORM& after) {
+    return is_int(after) && value == (is_true(expected, before) ? 0 : 1);
+}
+
+} // namespace
+
+const OPERATION mandatory_casts = {"casts", is_no_assignment, insert_mandatory_casts, nullptr, true};
+
+const std::vector<OPERATION> operations = {
+    {"simp", nullptr, [](NODE* t) { return simp_tree(t, nullptr); }, nullptr, true},
+    {"twice", nullptr, [](NODE* t) { return simp_tree(simp_tree(t, nullptr), nullptr); }, nullptr, true},
+    {"control", is_scalar, [](NODE* t) { return simp_for_control(simp_tree(t, nullptr), nullptr); }, same_truth, true},
+    {"boolean", is_scalar, [](NODE* t) { return make_boolean(simp_tree(t, nullptr), nullptr); }, truth_as_int, true},
+    {"invert", is_scalar, [](NODE* t) { return invert_boolean_tree(simp_tree(t, nullptr)); }, opposite_as_int, true},
+    {"peel", nullptr, peel_for_effect, nullptr, false},
+    {"simp and peel", nullptr, [](NODE* t) { return peel_for_effect(simp_tree(t, nullptr)); }, nullptr, false},
+    {"fold", nullptr, fold_constants, nullptr, true},
+};
+
+// ---- Contents of variables
+namespace {
+
+uint64_t boundary(int n, int bits) {
+    const uint64_t top = uint64_t(1) << (bits - 1);
+    switch (n) {
+    case 0: return 0;
+    case 1: return 1;
+    case 2: return ~uint64_t(0);
+    case 3: return top;
+    default: return top - 1;
+    }
+}
+
+double interesting_double(RANDOM& random) {
+    static const double some[] = {0.0,    -0.0,    1.0,        -1.0, 2.0,   0.5,       3.0,        0.1,      1e30,
+                                  -1e-30, 65536.0, 16777217.0, 7.0,  100.0, 1.0 / 0.0, -1.0 / 0.0, 0.0 / 0.0};
+    return some[random.pick(17)];
+}
+
+void put(MEMORY* m, uint32_t at, uint64_t bits, uint64_t units) {
+    for (uint64_t i = 0; i < units; ++i) (*m)[at + i] = static_cast<uint16_t>(bits >> (16 * i));
+}
+
+uint64_t scalar_content(const TYPE* type, int n, RANDOM& random) {
+    if (type->is_float()) {
+        const double d = n < 5 ? (n == 3 ? -0.0 : n == 4 ? 2.5 : n == 2 ? -1.0 : n) : interesting_double(random);
+        if (type->size == 64) return from_double(d);
+        const float f = static_cast<float>(d);
+        uint32_t w;
+        memcpy(&w, &f, sizeof w);
+        return w;
+    }
+    if (type->is_bool()) return n < 5 ? boundary(n, 16) & 1 : random.pick(2);
+    const int bits = static_cast<int>(type->size);
+    if (n < 5) return boundary(n, bits);
+    const uint64_t v = random.next();
+    switch (random.pick(6)) {
+    case 0: return boundary(static_cast<int>(random.pick(5)), bits);
+    case 1: return random.pick(10);
+    case 2: return -static_cast<uint64_t>(random.pick(10));
+    case 3: return uint64_t(1) << random.pick(static_cast<unsigned>(bits));
+    case 4: return v >> random.pick(64);
+    }
+    return v;
+}
+
+uint32_t some_address(const TYPE* pointee, RANDOM& random) {
+    const WORLD& w = world();
+    if (pointee->is_csu()) return w.address(random.pick(2) ? w.record : w.other_record);
+    if (pointee->size == 16 && random.pick(3)) return w.address(w.array) + random.pick(8);
+    return w.address(w.addressed[pointee->size == 16 ? 0 : 1]);
+}
+
+void fill_memory(MEMORY* memory, int n, RANDOM& random) {
+    memory->fill(0);
+    for (const SYMTAB* s : world().objects) {
+        const uint32_t at = world().address(s);
+        if (s->type->is_pointer())
+            put(memory, at, some_address(const_cast<TYPE*>(s->type)->type_pointed_to(), random), 2);
+        else if (s->type->is_scalar())
+            put(memory, at, scalar_content(s->type, n, random), s->type->size / 16);
+        else
+            for (uint64_t i = 0; i < s->type->size / 16; ++i)
+                put(memory, at + static_cast<uint32_t>(i), n < 5 ? boundary(n, 16) : random.next() >> 40, 1);
+    }
+}
+
+constexpr int BOUNDARY_ASSIGNMENTS = 5, IMAGES = 2048;
+
+// Ready-made contents of memory; the first of each BOUNDARY_ASSIGNMENTS are the boundaries.
+const MEMORY& image(uint64_t n) {
+    static const std::vector<MEMORY>* made = nullptr;
+    if (!made) {
+        auto* all = new std::vector<MEMORY>(IMAGES);
+        RANDOM random(1);
+        for (int i = 0; i < IMAGES; ++i) fill_memory(&(*all)[static_cast<size_t>(i)], i, random);
+        made = all;
+    }
+    return (*made)[n % IMAGES];
+}
+
+std::string event_text(const std::vector<EVENT>& events) {
+    std::string s;
+    for (const EVENT& e : events) {
+        char text[40];
+        snprintf(text, sizeof text, " %c:%llx", e.kind, static_cast<unsigned long long>(e.what & 0xFFFFFF));
+        s += text;
+    }
+    return s.empty() ? " none" : s;
+}
+
+std::string tree_text(const NODE* t) { return t ? tree_to_infix(t) : "nothing"; }
+
+} // namespace
+
+void TRIAL::begin(EVALUATOR* e, int assignment) const {
+    RANDOM random(seed * 64 + static_cast<uint64_t>(assignment));
+    const uint64_t r = random.next();
+    if (assignment < BOUNDARY_ASSIGNMENTS) {
+        e->begin(image(static_cast<uint64_t>(assignment)), r);
+        return;
+    }
+    e->begin(image(BOUNDARY_ASSIGNMENTS + r % (IMAGES - BOUNDARY_ASSIGNMENTS)), r);
+    if (constants.empty()) return;
+    for (const SYMTAB* s : variables)
+        if (random.one_in(2)) {
+            const uint64_t v = random.of(constants) + random.pick(3) - 1;
+            put(&e->memory, world().address(s), s->type->is_bool() ? v & 1 : v, s->type->size / 16);
+        }
+}
+
+std::string TRIAL::contents(int assignment) const {
+    EVALUATOR e;
+    begin(&e, assignment);
+    std::set<std::string> lines;
+    for_each_node(const_cast<NODE*>(tree), [&](const NODE* t) {
+        if (t->op != NAME || !t->type->is_scalar() || t->type->is_volatile()) return;
+        lines.insert(std::string(t->u.sym->name) + " = " + value_text(e.eval(t), form_of(t->type)));
+    });
+    std::string s;
+    for (const std::string& line : lines) s += (s.empty() ? "" : ", ") + line;
+    return s;
+}
+
+TRIAL::TRIAL(const NODE* t, uint64_t case_seed, int assignments) : tree(t), seed(case_seed), form(form_of(t->type)) {
+    for_each_node(const_cast<NODE*>(tree), [this](const NODE* n) {
+        if (n->op == ICON) constants.push_back(n->u.lval.value);
+        if (n->op == NAME && n->type->is_int() && !n->type->is_volatile()) variables.push_back(n->u.sym);
+    });
+    EVALUATOR e;
+    runs.reserve(static_cast<size_t>(assignments));
+    for (int n = 0; n < assignments; ++n) {
+        begin(&e, n);
+        const BITS v = e.eval(tree);
+        if (e.undefined) continue;
+        ++defined;
+        runs.push_back({n, v, e.overflowed, e.events, e.memory});
+    }
+}
+
+FINDING TRIAL::check(const OPERATION& op) const {
+    FINDING finding;
+    if (runs.empty() || (op.takes && !op.takes(tree))) return finding;
+    NODE* result = op.apply(copy_tree(tree));
+    auto report = [&](const std::string& what, int assignment) {
+        finding.what = std::string(op.name) + ": " + what;
+        finding.before = tree_text(tree);
+        finding.after = tree_text(result);
+        if (assignment >= 0) finding.contents = contents(assignment);
+    };
+    const FORM after = result ? form_of(result->type) : form;
+    if (op.value_counts && !op.agrees && !(after == form)) report("the result has another type", -1);
+    EVALUATOR e;
+    for (const RUN& r : runs) {
+        if (finding) break;
+        begin(&e, r.assignment);
+        const BITS v = result ? e.eval(result) : 0;
+        const bool agrees = op.agrees ? op.agrees(r.value, form, v, after) : same_value(r.value, v, form);
+        if (e.undefined)
+            report("the result does something undefined", r.assignment);
+        else if (op.value_counts && form.bits && !agrees)
+            report("value " + value_text(v, after) + " for " + value_text(r.value, form), r.assignment);
+        else if (e.events != r.events)
+            report("effects" + event_text(e.events) + " for" + event_text(r.events), r.assignment);
+        else if (e.memory != r.memory)
+            report("another content of memory", r.assignment);
+    }
+    if (result) erase_tree(result);
+    return finding;
+}
+
+} // namespace treecheck

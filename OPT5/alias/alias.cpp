@@ -1,8 +1,235 @@
-// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
-// meaning, and what is not known is assumed not to hold.
+// The rules on pairs of lvalues, from the cheapest to the dearest. The first that tells the two apart decides.
 #include "OPT5/alias/alias.h"
 
-void reset_alias_info() {}
-void init_dd_aliasing() {}
-void clean_up_alias_analysis_bitvecs_etc() {}
+#include "OPT5/alias/address_form.h"
+#include "OPT5/alias/state.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/target/bif.h"
+
+#include <cstring>
+#include <initializer_list>
+
+LOOP_ASSERTION_HOOKS loop_assertion_hooks;
+bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b) = nullptr;
+
+void init_dd_aliasing() { init_aliasing_info(true); }
 void propagate_PT_info() {}
+
+namespace {
+
+const NODE* without_wrappers(const NODE* t) {
+    while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || t->op == DDNODE ||
+           (t->op >= SSA_USE && t->op <= SSA_CHI))
+        t = t->left;
+    return t;
+}
+
+bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
+
+// The pointer that an lvalue is accessed through, null for a NAME.
+const NODE* pointer_of(const NODE* t) {
+    for (t = without_wrappers(t); t->op == STDOT;) t = without_wrappers(t->left);
+    return t->op == UMULT || t->op == STREF ? t->left : nullptr;
+}
+
+PTR* record_of(const NODE* lvalue) {
+    const NODE* pointer = pointer_of(lvalue);
+    const NODE* base = pointer ? address_expr_base(pointer) : nullptr;
+    return base ? find_or_make_PTR_entry(const_cast<NODE*>(base)) : nullptr;
+}
+
+bool is_automatic(const SYMTAB* sym) {
+    return sym->level >= 2 && (sym->sclass == SC_AUTO || sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2);
+}
+
+// The parameter that all values of a pointer come from, null for none: pointers from it never reach what was made after
+// the function was entered.
+const SYMTAB* parameter_behind(const NODE* lvalue) {
+    if (!groups_are_known()) return nullptr;
+    const PTR* p = record_of(lvalue);
+    const PTR* root = p ? p->root : nullptr;
+    return root && !(root->flags & PTR_IS_BOTTOM) && root->symbol->level == 1 && root->root == root ? root->symbol
+                                                                                                    : nullptr;
+}
+
+bool is_string_access(const NODE* lvalue) {
+    const NODE* pointer = pointer_of(lvalue);
+    const NODE* base = pointer ? pointer_basis(pointer) : nullptr;
+    return base && base->op == SCON;
+}
+
+// A fixed address may be the place of a global that the linker was told to put there.
+bool is_placed_by_linker_alone(const SYMTAB* sym) {
+    return is_automatic(sym) || (sym->sclass != SC_EXTERN && !sym->pragma);
+}
+
+// `object` is accessed by one lvalue; the other, `indirect`, has no known object.
+bool is_out_of_reach(const SYMTAB* object, const NODE* indirect, const ADDRESS_FORM& form) {
+    if (object->is_function()) return false;
+    if (!may_be_reached_by_pointers(object)) return true;
+    if (is_automatic(object) && parameter_behind(indirect)) return true;
+    if (form.is_absolute()) return is_placed_by_linker_alone(object);
+    return is_string_access(indirect);
+}
+
+bool are_told_apart_by_records(const NODE* a, const NODE* b) {
+    const SYMTAB *p = parameter_behind(a), *q = parameter_behind(b);
+    if (pointer_args_are_disjoint && p && q && p != q) return true;
+    const PTR *x = record_of(a), *y = record_of(b);
+    return x && y && x->flags & y->flags & PTR_IS_DISJOINTED && x->root != y->root;
+}
+
+} // namespace
+
+bool object_symbols_may_alias(const SYMTAB* a, const SYMTAB* b) {
+    if (!a || !b || a == b) return true;
+    if ((a->lives_in_others && b->hosts_others) || (b->lives_in_others && a->hosts_others)) return true;
+    if (a->level == 0 && b->level == 0) {
+        // A declaration and its definition, and names that the linker may give another meaning.
+        if (!std::strcmp(a->name, b->name)) return true;
+        return a->pragma && b->pragma && (find_pragma(a, PRG_WEAK) || find_pragma(b, PRG_WEAK));
+    }
+    // A parameter and the variable that it is copied into may be given one place.
+    const SYMTAB* parm = a->level == 1 ? a : b;
+    const SYMTAB* local = parm == a ? b : a;
+    return parm->level == 1 && local->level == 2 && map_sym_to_parm(local) == parm;
+}
+
+bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, bool by_type, bool* unsure) {
+    a = without_wrappers(a);
+    b = without_wrappers(b);
+    if (!is_lvalue(a) || !is_lvalue(b)) {
+        if (unsure) *unsure = true;
+        return true;
+    }
+    if (lvalue_is_volatile(a) && lvalue_is_volatile(b))
+        return true; // what their order is for may lie outside of memory
+    if (a->op == NAME && b->op == NAME) return object_symbols_may_alias(a->u.sym, b->u.sym);
+    const ADDRESS_FORM x = address_form(a), y = address_form(b);
+    const SYMTAB *object_a = x.known_object(), *object_b = y.known_object();
+    if (object_a && object_b) {
+        if (object_a == object_b) return !accesses_are_disjoint(x, y, loop);
+        return object_symbols_may_alias(object_a, object_b);
+    }
+    if (object_a && is_out_of_reach(object_a, b, y)) return false;
+    if (object_b && is_out_of_reach(object_b, a, x)) return false;
+    if (accesses_are_disjoint(x, y, loop)) return false;
+    if (unaliased_by_scope(a, b) || are_told_apart_by_records(a, b)) return false;
+    if (UMULT_PT_targets_may_overlap && a->ptenv && b->ptenv && !UMULT_PT_targets_may_overlap(a, b)) return false;
+    const NODE *p = pointer_of(a), *q = pointer_of(b);
+    if (loop && p && q && pointers_are_antialiased(p, q, loop, loop)) return false;
+    if (by_type) {
+        bool exact_a, exact_b;
+        TYPE *type_a = true_type(a, &exact_a), *type_b = true_type(b, &exact_b);
+        if (!types_may_be_aliased(type_a, exact_a, type_b, exact_b)) return false;
+    }
+    if (unsure) *unsure = true;
+    return true;
+}
+
+// ---- restrict
+
+namespace {
+
+// The record of an lvalue's pointer if that is `restrict` and keeps the value that it was declared with.
+const PTR* restricted_record(const NODE* lvalue) {
+    const PTR* p = record_of(lvalue);
+    if (!p || !(p->flags & PTR_IS_RESTRICTED) || p->member) return nullptr;
+    if (p->flags & (PTR_IS_REASSIGNED | PTR_IS_FILE_LEVEL | PTR_IS_BOTTOM)) return nullptr;
+    return p->scope && !may_be_reached_by_pointers(p->symbol) ? p : nullptr;
+}
+
+// In the scope of `p` what it points to is accessed through it and what is derived from it alone.
+bool is_kept_from(const PTR* p, const NODE* through_p, const NODE* other) {
+    if (!through_p->ls || !other->ls || !p->scope->encloses(through_p->ls) || !p->scope->encloses(other->ls))
+        return false;
+    const PTR* q = record_of(other);
+    if (q) return !(q->root->flags & PTR_IS_BOTTOM) && q->root != p->root;
+    // An object by its name: the pointer of a local scope may have been replaced by it in places.
+    return p->root->symbol->level == 1 && !(p->root->flags & PTR_IS_BOTTOM) && address_form(other).object;
+}
+
+} // namespace
+
+bool unaliased_by_scope(const NODE* a, const NODE* b) {
+    if (a == b || !groups_are_known()) return false;
+    const PTR* p = restricted_record(a);
+    if (p && is_kept_from(p, a, b)) return true;
+    p = restricted_record(b);
+    return p && is_kept_from(p, b, a);
+}
+
+// ---- Assertions of loops
+
+namespace {
+
+const NODE* bare_pointer(const NODE* p) {
+    while (p->op == OUIALIGN || p->op == NONALIGN || p->op == IDENTITY ||
+           ((p->op == PCONV || p->op == ISP2CHAR) && p->left->type->is_pointer()))
+        p = p->left;
+    return p;
+}
+
+int depth_of(struct LOOP* loop) {
+    int depth = 0;
+    for (; loop; loop = loop_assertion_hooks.parent(loop)) ++depth;
+    return depth;
+}
+
+struct LOOP* innermost_common_loop(struct LOOP* a, struct LOOP* b) {
+    int da = depth_of(a), db = depth_of(b);
+    for (; da > db; --da) a = loop_assertion_hooks.parent(a);
+    for (; db > da; --db) b = loop_assertion_hooks.parent(b);
+    for (; a != b; b = loop_assertion_hooks.parent(b)) a = loop_assertion_hooks.parent(a);
+    return a;
+}
+
+} // namespace
+
+bool pointers_are_antialiased(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q) {
+    const LOOP_ASSERTION_HOOKS& hooks = loop_assertion_hooks;
+    if (!loop_p || !loop_q || !hooks.parent || !hooks.assertions) return false;
+    p = bare_pointer(p);
+    q = bare_pointer(q);
+    for (struct LOOP* loop = innermost_common_loop(loop_p, loop_q); loop; loop = hooks.parent(loop)) {
+        const std::vector<NODE*>* assertions = hooks.assertions(loop);
+        if (!assertions) continue;
+        for (const NODE* fact : *assertions) {
+            if (!is_ANTIALIASED_ICALL(fact)) continue;
+            const NODE *x = arg_list_lookup(fact->left, 0), *y = arg_list_lookup(fact->left, 1);
+            if (!x || !y) continue;
+            x = bare_pointer(x);
+            y = bare_pointer(y);
+            if (trees_are_congruent(x, p, false) && trees_are_congruent(y, q, false)) return true;
+            if (trees_are_congruent(x, q, false) && trees_are_congruent(y, p, false)) return true;
+        }
+    }
+    return false;
+}
+
+void add_antialiasing_loop_assertion(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q) {
+    const LOOP_ASSERTION_HOOKS& hooks = loop_assertion_hooks;
+    if (!loop_p || !loop_q || !hooks.parent || !hooks.add || pointers_are_antialiased(p, q, loop_p, loop_q)) return;
+    struct LOOP* loop = innermost_common_loop(loop_p, loop_q);
+    if (!loop) return;
+    hooks.add(loop, make_ANTIALIASED_ICALL(copy_tree(bare_pointer(p)), copy_tree(bare_pointer(q))));
+}
+
+// ---- Shapes
+
+bool may_be_an_internal_lvalue(const NODE* t) {
+    for (t = without_wrappers(t); t->op == STDOT;) t = without_wrappers(t->left);
+    if (const SYMTAB* sym = object_name_if_known(t))
+        if (is_internal_symbol(sym)) return true;
+    return get_vector_or_complex_symbol(t) != nullptr;
+}
+
+bool is_an_array_reference(const NODE* lvalue) {
+    for (lvalue = without_wrappers(lvalue); lvalue->op == STDOT;) lvalue = without_wrappers(lvalue->left);
+    if (lvalue->op != UMULT) return false;
+    const SYMTAB* object = address_form(lvalue).object;
+    return object && object->type->is_array();
+}

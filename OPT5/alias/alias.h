@@ -1,11 +1,97 @@
-// Which memory references may meet.
+// Which memory references may meet: the one place that answers for every pass that moves a load or a store.
+//
+// Every question here is a "may": where it cannot be decided the answer is true. Lvalues are NAME, UMULT, STREF and
+// STDOT trees, also under DDNODE, SSA operators and the transparent wrappers; they are borrowed and left alone.
+// `lvalues_may_be_aliased` and what is built on it rely on the marks that `init_aliasing_info` sets.
 #pragma once
 
-// What is known of the current function's references is dropped.
-void reset_alias_info();
+#include "IFILE/base_node.h"
 
-void init_dd_aliasing();
+#include <vector>
+
+class BBLK;
+class BITVEC;
+class FUNINFO;
+class NODE;
+class SYMTAB;
+class TYPE;
+struct LOOP;
+struct LS;
+struct fkMDATA;
+
+// ---- Life
+// Sets `is_aliased` of every symbol of the current function and of the globals: true for an object that something other
+// than its own NAME may reach. `groups`: the equivalence groups of pointers are built as well, if the scopes are known.
+void init_aliasing_info(bool groups);
+// Marks the vector and complex variables that are accessed by parts or as another type. `clear_bitnum` also takes them
+// out of the candidates that are numbered by `bitnum`; `aliased` is the mark that they get.
+void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased);
+// Marks what `tree` takes the address of. A scalar is marked by any UAND or ARGREF; an array by one that is not merely
+// the address of an access.
+void mark_addressed_symbols(NODE* tree);
+void reset_alias_info(); // what is known of the current function's references is dropped
 void clean_up_alias_analysis_bitvecs_etc();
+void init_dd_aliasing();
+void propagate_PT_info(); // points-to sets of the current function's pointers
+// Whether the uses of every file-scope symbol have been entered in its `cqual`: from the step that analyzes them on.
+extern bool file_symbols_are_known;
+bool file_symbol_may_be_aliased(const SYMTAB* sym); // reached other than by its name, as far as the program is known
 
-// Points-to sets of the current function's pointers.
-void propagate_PT_info();
+// ---- Pairs
+// `exactN`: the lvalue is known to have that declared type, so that access as a character does not excuse it.
+bool types_may_be_aliased(TYPE* t1, bool exact1, TYPE* t2, bool exact2);
+// Whether `a` and `b` may share memory: evaluated with the same values of the variables in them where `loop` is null,
+// in any two iterations of `loop` where it is not. `by_type` false leaves out the rule on types. `*unsure` is set where
+// the answer true is a guess.
+bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop = nullptr, bool by_type = true,
+                            bool* unsure = nullptr);
+bool object_symbols_may_alias(const SYMTAB* a, const SYMTAB* b);
+bool unaliased_by_scope(const NODE* a, const NODE* b); // by `restrict`
+// Whether an assertion of a loop around both says that what `p` and `q` point to is disjoint.
+bool pointers_are_antialiased(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q);
+// What lists the assertions of a loop and its parent; null while no loops are known.
+struct LOOP_ASSERTION_HOOKS {
+    const std::vector<NODE*>* (*assertions)(struct LOOP* loop) = nullptr;
+    struct LOOP* (*parent)(struct LOOP* loop) = nullptr;
+    void (*add)(struct LOOP* loop, NODE* assertion) = nullptr; // takes the tree
+    bool (*tree_is_RC_in_loop)(const NODE* tree, struct LOOP* loop) = nullptr;
+};
+extern LOOP_ASSERTION_HOOKS loop_assertion_hooks;
+// Whether the points-to environments of two accesses leave them a common place; null while there are none.
+extern bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b);
+void add_antialiasing_loop_assertion(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q);
+
+// ---- Effects
+// Whether evaluating `a` may change what `t` reads: the objects, and the addresses it reads them by.
+bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t);
+bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t);
+// Whether evaluating `a` may write to, or may read or write, the object of `lvalue`.
+bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue);
+bool tree_touches_lvalue(const NODE* a, const NODE* lvalue);
+// What a call does outside its own frame: to the object of `lvalue`, which may be null for "anything at all".
+bool call_may_modify(const NODE* call, const NODE* lvalue);
+bool call_may_read(const NODE* call, const NODE* lvalue);
+bool call_assigns_thru_byref_args(const NODE* call);
+bool byref_arg_is_not_assigned_thru(int index, SYMTAB* callee); // argument from 0; null: unknown
+
+// The lvalues that a pass keeps facts on, numbered by their place; a set of `kill_aliases_*` has a bit for each. Trees
+// other than lvalues are killed with what they read. The trees must stand until `clean_up_alias_analysis_bitvecs_etc`.
+void compute_alias_sets(const std::vector<const NODE*>& lvalues);
+void kill_aliases_of_lvalue(const NODE* lvalue, BITVEC* set);
+// What an access of unknown address changes, in `scope` if that is not null; `tree` is the access or null.
+void kill_aliases_indirect(const LS* scope, const NODE* tree, BITVEC* set, unsigned flags = 0);
+void kill_aliases_on_call(const NODE* call, BITVEC* set);
+void kill_assertions(BITVEC* set);
+
+// ---- Shapes
+TYPE* true_type(const NODE* tree, bool* exact); // the declared type of the object that an lvalue accesses
+const NODE* pointer_basis(const NODE* pointer); // what a pointer is computed from: NAME, UMULT, STDOT, UAND or null
+const NODE* address_expr_base(const NODE* pointer);
+bool may_be_an_internal_lvalue(const NODE* tree);
+SYMTAB* get_vector_or_complex_symbol(const NODE* tree); // the vector or complex variable that an lvalue is part of
+bool is_an_array_reference(const NODE* lvalue);
+
+// ---- Alignment in bits of an access, of which 0 is never given
+unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop);
+unsigned nonaligned_pointee_alignment(const NODE* pointer, struct LOOP* loop); // less what NONALIGN takes back
+unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop);

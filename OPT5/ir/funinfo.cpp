@@ -6,6 +6,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "UTIL/abort.h"
 
@@ -88,7 +89,8 @@ void init_FUNINFO_flags(FUNINFO* f, int known_system) {
 
 // ---- Records
 
-FUNINFO::FUNINFO(const char* function_name) : name(function_name) {}
+FUNINFO::FUNINFO(const char* function_name)
+    : name(function_name), spmap(std::make_unique<SPMAP>()), snmap(std::make_unique<SNMAP>()) {}
 FUNINFO::~FUNINFO() = default;
 
 namespace {
@@ -293,6 +295,8 @@ void erase_all() {
     f->givens.clear();
     erase_eht(f);
     f->dominators.reset();
+    f->spmap->clear();
+    f->snmap->clear();
     for (SYMTAB** list : {&f->new_syms, &f->pending_syms, &f->memory_syms, &f->scalar_syms}) erase_symbols(*list);
     for (SYMTAB* sym : f->dropped_syms) delete sym;
     f->dropped_syms.clear();

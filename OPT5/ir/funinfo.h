@@ -22,6 +22,8 @@ class BITVEC;
 class Dominator;
 class FUNINFO;
 class NODE;
+class SNMAP;
+class SPMAP;
 struct LBL;
 
 enum FUN_FLAG : uint64_t {
@@ -124,6 +126,8 @@ public:
     PTR* ptrs = nullptr; // all records, most recent first
     PTR* bottom_ptr = nullptr;
     std::map<std::pair<SYMTAB*, fkMDATA*>, PTR*> ptr_map; // looked up, never walked
+    std::unique_ptr<SPMAP> spmap; // what pointer variables point into; never null
+    std::unique_ptr<SNMAP> snmap; // the values in force during constant propagation; never null
     OVERLAP* overlaps = nullptr;
     uint32_t name_counter = 0;
     bool address_taken_local = false, has_bitfield_access = false, has_cqual10_name = false;

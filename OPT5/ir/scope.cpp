@@ -161,7 +161,8 @@ bool is_a_parameter(const SYMTAB* sym) { return sym->level == 1 || (sym->level =
 
 PTR* make_PTR_entry(SYMTAB* sym, fkMDATA* member) {
     auto* ptr = new PTR;
-    ptr->root = ptr;
+    // Until the groups are built anew nothing is known of what it is derived from.
+    ptr->root = currfuninfo->bottom_ptr ? currfuninfo->bottom_ptr : ptr;
     ptr->symbol = sym;
     ptr->member = member;
     ptr->scope = sym->level == 0 ? currfuninfo->ls_root : sym->scope;

@@ -75,6 +75,8 @@ struct LS {
     bool encloses(const LS* other) const; // itself included
     bool is_strictly_contained_by(const LS* other) const;
     static bool object_may_be_live_in_scope(const SYMTAB* sym, const LS* scope);
+    // Joins the pointers of the current function that are derived from each other under one `root`.
+    static void build_PTR_equivalence_groups();
     void validate() const;
     void print(FILE* out, int indent = 0) const;
 };

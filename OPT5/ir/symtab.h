@@ -97,6 +97,8 @@ public:
     bool fl_static_eligible = false;
     bool written_as_parameter = false; // entered the function as a parameter record
     bool is_clustered = false;
+    bool lives_in_others = false; // its storage may lie in that of a symbol with `hosts_others`
+    bool hosts_others = false;
     NODE* size_tree = nullptr;
 
     SYMTAB() = default;

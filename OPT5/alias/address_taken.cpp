@@ -1,0 +1,160 @@
+// Which objects something other than their own name may reach.
+//
+// A mark that is missing makes every later answer wrong, so whatever is not understood marks. What keeps an object
+// unmarked: all its accesses go through its NAME, or, for an array, through an address from which
+// `object_name_if_known` finds the array again.
+#include "OPT5/alias/alias.h"
+
+#include "OPT5/alias/state.h"
+#include "OPT5/alias/walks.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/symbol_maps.h"
+
+bool file_symbols_are_known = false;
+
+bool file_symbol_may_be_aliased(const SYMTAB* sym) {
+    return !file_symbols_are_known || alias_vars_option || (sym->cqual & CQ_ALIASED);
+}
+
+namespace {
+
+bool is_plain_array(const TYPE* type) { return type->is_array() && !type->is_vector(); }
+
+void mark(SYMTAB* sym) {
+    if (!sym->is_function()) sym->set_is_aliased(true);
+}
+
+// `is_access_address`: `t` is the pointer of an access, from which the object can be told.
+void mark_addressed(const NODE* t, bool is_access_address) {
+    while (t) {
+        const NODE* next = t->left;
+        bool keeps = false;
+        switch (t->op) {
+        case NAME:
+            if (t->u.sym && is_plain_array(t->type)) mark(t->u.sym);
+            return;
+        case ARASG: // assigns arrays as values
+            for (const NODE* side : {t->left, t->right})
+                if (side->op != NAME) mark_addressed(side, false);
+            return;
+        case UMULT:
+            mark_addressed(t->right, false);
+            is_access_address = t->left->type->is_pointer();
+            t = next;
+            continue;
+        case STREF:
+            is_access_address = t->left->type->is_pointer();
+            t = next;
+            continue;
+        case STDOT:
+            while (next->op == STDOT) next = next->left;
+            if (next->op == NAME) return;
+            break;
+        case UAND:
+        case ARGREF: {
+            const NODE* object = t->left;
+            while (object->op == STDOT) object = object->left;
+            if (object->op == NAME) {
+                if (t->op == ARGREF || !is_access_address || !is_plain_array(t->left->type)) mark(object->u.sym);
+                return;
+            }
+            // The address of what a pointer points to is that pointer.
+            if (object->op == UMULT && !object->right) {
+                is_access_address &= t->op == UAND && object->left->type->is_pointer();
+                t = object->left;
+                continue;
+            }
+            if (object->op == STREF) {
+                is_access_address &= t->op == UAND;
+                t = object->left;
+                continue;
+            }
+            next = object;
+            break;
+        }
+        case PLUS:
+        case MINUS:
+            keeps = is_access_address && t->type->is_pointer();
+            mark_addressed(t->right, keeps && t->op == PLUS && !t->left->type->is_pointer());
+            break;
+        case PCONV:
+        case ISP2CHAR:
+        case IDENTITY:
+        case OUIALIGN:
+        case NONALIGN: keeps = is_access_address && t->type->is_pointer(); break;
+        default: mark_addressed(t->right, false);
+        }
+        is_access_address = keeps && next && next->type->is_pointer();
+        t = next;
+    }
+}
+
+template <class F>
+void for_each_symbol(const F& visit) {
+    const FUNINFO* f = currfuninfo;
+    for (SYMTAB* list : {f->new_syms, f->pending_syms, f->memory_syms, f->scalar_syms})
+        for (SYMTAB* s = list; s; s = s->next) visit(s);
+}
+
+bool is_vector_or_complex(const TYPE* type) { return type->is_vector() || type->is_vpred() || type->is_complex(); }
+
+bool is_part_selector(int op) {
+    return op == REAL || op == IMAG || op == VFIELD || op == SIMDHI || op == SIMDLO || op == VRCONV || op == STDOT;
+}
+
+} // namespace
+
+void mark_addressed_symbols(NODE* tree) { mark_addressed(tree, false); }
+
+namespace {
+const FUNINFO* marked_function = nullptr;
+}
+
+bool marks_are_known() { return marked_function && marked_function == currfuninfo; }
+
+bool may_be_reached_by_pointers(const SYMTAB* sym) {
+    if (sym->is_function()) return false;
+    return !marks_are_known() || sym->is_aliased();
+}
+
+void init_aliasing_info(bool groups) {
+    FUNINFO* f = currfuninfo;
+    for_each_symbol([](SYMTAB* s) { s->set_is_aliased(false); });
+    for (SYMTAB* s : f->dropped_syms) s->set_is_aliased(false);
+    for (SYMTAB* s = global_symbols; s; s = s->next) s->set_is_aliased(file_symbol_may_be_aliased(s));
+    for_each_tree(f, [](const NODE* tree) { mark_addressed(tree, false); });
+    mark_aliased_vector_and_complex_symbols(false, true);
+    marked_function = f;
+    // From here on what depends on the marks.
+    if (groups && f->ls_root && f->bottom_ptr)
+        LS::build_PTR_equivalence_groups();
+    else
+        forget_groups();
+    find_pointees();
+}
+
+void reset_alias_info() {
+    marked_function = nullptr;
+    forget_groups();
+    if (currfuninfo) currfuninfo->spmap->clear();
+    compute_alias_sets({});
+}
+
+SYMTAB* get_vector_or_complex_symbol(const NODE* t) {
+    while (is_part_selector(t->op)) t = t->left;
+    SYMTAB* sym = object_name_if_known(t);
+    return sym && is_vector_or_complex(sym->type) ? sym : nullptr;
+}
+
+void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased) {
+    for_each_tree(currfuninfo, [=](const NODE* tree) {
+        for_each_subtree(tree, [=](const NODE* t) {
+            const NODE* to = t->left;
+            if (!writes_left_operand(t->op) || !to || to->op == NAME) return;
+            SYMTAB* sym = get_vector_or_complex_symbol(to);
+            if (!sym) return;
+            sym->set_is_aliased(aliased);
+            if (clear_bitnum) sym->set_bitnum(-1);
+        });
+    });
+}

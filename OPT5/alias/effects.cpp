@@ -1,0 +1,243 @@
+// What evaluating a tree does to memory, and which facts about memory it ends.
+#include "OPT5/alias/alias.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/alias/address_form.h"
+#include "OPT5/alias/state.h"
+#include "OPT5/alias/walks.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/target/bif.h"
+
+namespace {
+
+bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
+
+const NODE* written_lvalue(const NODE* t) {
+    while (t->op == SIMDHI || t->op == SIMDLO || t->op == REAL || t->op == IMAG || t->op == VRCONV || t->op == VFIELD ||
+           t->op == DDNODE || t->op == IDENTITY || (t->op >= SSA_USE && t->op <= SSA_CHI))
+        t = t->left;
+    return t;
+}
+
+// A pointer handed out may be used for any address in the object that it points into, and, where that is not known, in
+// any object that pointers reach.
+bool pointer_may_reach(const NODE* pointer, const NODE* lvalue) {
+    if (!pointer->type->is_pointer() && pointer->op != ARGREF && pointer->op != UAND) return false;
+    const SYMTAB* object = lvalue ? address_form(lvalue).known_object() : nullptr;
+    if (!object) return true;
+    const NODE* basis = pointer_basis(pointer);
+    const NODE* place = pointer->op == ARGREF ? pointer->left : basis && basis->op == UAND ? basis->left : nullptr;
+    if (place)
+        if (const SYMTAB* target = object_name_if_known(place)) return object_symbols_may_alias(object, target);
+    return may_be_reached_by_pointers(object);
+}
+
+bool any_argument_reaches(const NODE* call, const NODE* lvalue, SYMTAB* callee, bool skip_unassigned) {
+    const NODE* list = get_arguments_to_call(call);
+    const int count = arg_list_count(list);
+    for (int i = 0; i < count; ++i) {
+        const NODE* arg = arg_list_lookup(const_cast<NODE*>(list), i);
+        if (skip_unassigned && byref_arg_is_not_assigned_thru(i, callee)) continue;
+        if (pointer_may_reach(arg, lvalue)) return true;
+    }
+    return false;
+}
+
+struct CALL_BITS {
+    uint64_t no_global, no_indirect;
+};
+constexpr CALL_BITS WRITES = {FUN_no_global_asg, FUN_no_ind_asg};
+constexpr CALL_BITS READS = {FUN_no_global_use, FUN_no_ind_use};
+
+bool callee_may_access(const NODE* call, const NODE* lvalue, const CALL_BITS& bits, bool writes) {
+    FUNINFO* f = find_FUNINFO_for_call(call);
+    const uint64_t flags = f ? get_flags(f) : 0;
+    if (flags & FUN_is_pure_fun) return false;
+    const SYMTAB* object = lvalue ? address_form(lvalue).known_object() : nullptr;
+    if (!object) return (flags & bits.no_global) == 0 || (flags & bits.no_indirect) == 0;
+    if (writes && symbol_is_immutable(object)) return false;
+    const bool is_reached = may_be_reached_by_pointers(object);
+    if (object->level > 0 && !is_reached) return false;
+    if (object->level == 0 && !(flags & bits.no_global)) return true;
+    if (!is_reached || flags & bits.no_indirect) return false;
+    // The library keeps no pointers to objects of the program but in what it was handed.
+    if (flags & FUN_is_SYSTEM && flags & bits.no_global)
+        return any_argument_reaches(call, lvalue, f->symbol, writes) && (!writes || call_assigns_thru_byref_args(call));
+    return true;
+}
+
+// A machine operation may do anything but touch a variable that has no address and is not handed to it.
+bool machine_call_may_access(const NODE* call, const NODE* lvalue) {
+    const SYMTAB* object = lvalue ? address_form(lvalue).known_object() : nullptr;
+    if (!object || object->level == 0 || may_be_reached_by_pointers(object)) return true;
+    return any_argument_reaches(call, lvalue, nullptr, false);
+}
+
+bool copy_may_access(const NODE* copy, const NODE* lvalue, bool writes) {
+    const NODE* place = arg_list_lookup(copy->left, writes ? 0 : 1);
+    return !place || pointer_may_reach(place, lvalue);
+}
+
+bool call_may_access(const NODE* call, const NODE* lvalue, const CALL_BITS& bits, bool writes) {
+    switch (call->op) {
+    case CALL:
+    case UCALL: return callee_may_access(call, lvalue, bits, writes);
+    case ICALL:
+    case UICALL: return false; // a value of its operands
+    case MEMCPY: return copy_may_access(call, lvalue, writes);
+    default: return machine_call_may_access(call, lvalue);
+    }
+}
+
+bool asm_may_access(const NODE* t, const NODE* lvalue) {
+    if (tree_is_ASM_comment(t)) return false;
+    const SYMTAB* object = lvalue ? address_form(lvalue).known_object() : nullptr;
+    return !object || object->level == 0 || may_be_reached_by_pointers(object);
+}
+
+bool is_inert(int op) {
+    return op == PPRAGMA || op == NASSERT || op == ASSERT || op == LABELDEF || op == NOP || op == SKIP;
+}
+
+// One node of a tree, its operands aside.
+bool node_may_modify(const NODE* t, const NODE* lvalue) {
+    if (writes_left_operand(t->op)) return !t->left || lvalues_may_be_aliased(written_lvalue(t->left), lvalue);
+    if (op_is_call(t->op) || op_is_intrinsic(t->op) || t->op == MEMCPY) return call_may_modify(t, lvalue);
+    if (t->op == ASM) return asm_may_access(t, lvalue);
+    // A volatile access is an event, that keeps its order to other events.
+    if (is_lvalue(t) && lvalue_is_volatile(t)) return lvalue_is_volatile(lvalue);
+    if (is_inert(t->op) || t->op == PCOMMA || t->op == COMMAOP || t->op == DDNODE) return false;
+    return side_effects[t->op] == 255;
+}
+
+template <class P>
+bool any_subtree(const NODE* t, const P& predicate) {
+    for (; t; t = t->left)
+        if (predicate(t) || any_subtree(t->right, predicate)) return true;
+    return false;
+}
+
+// The outermost lvalues that `t` reads and those that their addresses are computed from.
+template <class P>
+bool any_lvalue_read(const NODE* t, const P& predicate) {
+    for (; t; t = t->left) {
+        if (t->op == UAND || t->op == ARGREF) { // the address alone
+            const NODE* object = t->left;
+            while (object->op == STDOT) object = object->left;
+            if (object->op == NAME) return t->op == ARGREF && predicate(object);
+            if (object->op == UMULT || object->op == STREF) {
+                if (object->op == UMULT && any_lvalue_read(object->right, predicate)) return true;
+                t = object;
+                continue;
+            }
+        }
+        if (is_lvalue(t) && predicate(t)) return true;
+        while (t->op == STDOT) t = t->left; // one access with its parts
+        if (t->op == NAME) return false;
+        if (any_lvalue_read(t->right, predicate)) return true;
+    }
+    return false;
+}
+
+} // namespace
+
+// ---- Calls
+
+bool call_may_modify(const NODE* call, const NODE* lvalue) { return call_may_access(call, lvalue, WRITES, true); }
+bool call_may_read(const NODE* call, const NODE* lvalue) { return call_may_access(call, lvalue, READS, false); }
+
+bool call_assigns_thru_byref_args(const NODE* call) {
+    if (call->op == MEMCPY || call->op == MCALL) return true;
+    if (call->op == ICALL) return false;
+    FUNINFO* f = find_FUNINFO_for_call(call);
+    return !f || !TEST_FLAG(f, FUN_no_byref_asg);
+}
+
+bool byref_arg_is_not_assigned_thru(int index, SYMTAB* callee) {
+    FUNINFO* f = callee ? find_FUNINFO(callee) : nullptr;
+    if (!f) return false;
+    if (TEST_FLAG(f, FUN_no_byref_asg)) return true;
+    // `const` is a promise that a cast may break, except by the library.
+    if (!TEST_FLAG(f, FUN_is_SYSTEM)) return false;
+    const TYPE* type = type_of_nth_parameter(index, callee);
+    return type && type->is_pointer() && type->type_pointed_to()->is_const();
+}
+
+// ---- Trees
+
+bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
+    return any_subtree(a, [lvalue](const NODE* t) { return node_may_modify(t, lvalue); });
+}
+
+bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {
+    if (tree_modifies_lvalue(a, lvalue)) return true;
+    if (any_lvalue_read(a, [lvalue](const NODE* t) { return lvalues_may_be_aliased(t, lvalue); })) return true;
+    return any_subtree(a, [lvalue](const NODE* t) {
+        return (op_is_call(t->op) || op_is_intrinsic(t->op) || t->op == MEMCPY) && call_may_read(t, lvalue);
+    });
+}
+
+bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t) {
+    if (tree_contains_op(t, ASM)) return true;
+    if (any_lvalue_read(t, [a](const NODE* lvalue) { return tree_modifies_lvalue(a, lvalue); })) return true;
+    // What a call in `t` reads is not in the tree.
+    return any_subtree(t, [a](const NODE* call) {
+        if (!op_is_call(call->op) && call->op != MCALL && call->op != UMCALL && call->op != MEMCPY) return false;
+        FUNINFO* f = find_FUNINFO_for_call(call);
+        return !(f && TEST_FLAG(f, FUN_is_pure_fun)) && tree_has_side_effects(a);
+    });
+}
+
+bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (tree_modifies_lvalue_in_tree(s->first, t)) return true;
+    return false;
+}
+
+// ---- Sets
+
+namespace {
+
+std::vector<const NODE*> numbered;
+
+template <class P>
+void kill_where(BITVEC* set, const P& predicate) {
+    for (uint32_t i = set->next_set(0); i < set->bits; i = set->next_set(i + 1))
+        if (i >= numbered.size() || predicate(numbered[i])) set->clear(i);
+}
+
+} // namespace
+
+void compute_alias_sets(const std::vector<const NODE*>& lvalues) { numbered = lvalues; }
+void clean_up_alias_analysis_bitvecs_etc() { std::vector<const NODE*>().swap(numbered); }
+
+void kill_aliases_of_lvalue(const NODE* lvalue, BITVEC* set) {
+    kill_where(set, [lvalue](const NODE* fact) {
+        return any_lvalue_read(fact, [lvalue](const NODE* t) { return lvalues_may_be_aliased(lvalue, t); });
+    });
+}
+
+void kill_aliases_indirect(const LS* scope, const NODE* tree, BITVEC* set, unsigned) {
+    if (tree) return kill_aliases_of_lvalue(tree, set);
+    kill_where(set, [scope](const NODE* fact) {
+        return any_lvalue_read(fact, [scope](const NODE* t) {
+            const SYMTAB* object = address_form(t).known_object();
+            if (!object) return true;
+            return may_be_reached_by_pointers(object) && LS::object_may_be_live_in_scope(object, scope);
+        });
+    });
+}
+
+void kill_aliases_on_call(const NODE* call, BITVEC* set) {
+    kill_where(set, [call](const NODE* fact) {
+        return any_lvalue_read(fact, [call](const NODE* t) { return call_may_modify(call, t); });
+    });
+}
+
+void kill_assertions(BITVEC* set) {
+    kill_where(set, [](const NODE* fact) {
+        return fact->op == ASSERT || fact->op == NASSERT || is_def_assert_ICALL_tree(fact) ||
+               is_ANTIALIASED_ICALL(fact);
+    });
+}

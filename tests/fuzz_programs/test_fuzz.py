@@ -3,6 +3,7 @@ import importlib.machinery
 import importlib.util
 import os
 import re
+import shutil
 import subprocess
 import sys
 import tempfile
@@ -99,6 +100,25 @@ class Faults(unittest.TestCase):
         done = self.fuzz("exit 3", source=self.folder / "endless.c")
         self.assertEqual(done.returncode, 0)
         self.assertRegex(done.stdout, r"skip endless: .*\n1 programs, 0 runs, 0 differences, 1 skipped\n$")
+
+    @unittest.skipUnless(shutil.which("clang") and shutil.which("llc"), "needs clang and llc")
+    def test_the_other_compiler_finds_a_wrong_executor(self):
+        liar = self.folder / "icrun"
+        liar.write_text(f"#!/bin/sh\n{os.environ['ICRUN']} \"$@\" | sed s/14/15/\n")
+        liar.chmod(0o755)
+        done = self.fuzz("cp $in $out", "--levels", "0", "--crosscheck", "--icrun", liar)
+        self.assertIn("FAIL right crosscheck: crosscheck: line 3: '15' instead of '14'\n", done.stdout)
+        self.assertIn("1 differences, 0 skipped, 1 judged by the other compiler", done.stdout)
+        self.assertNotIn("opt_level", (self.folder / "found" / "right" / "show.sh").read_text())
+        done = self.fuzz("cp $in $out", "--levels", "0", "--crosscheck")
+        self.assertEqual(done.returncode, 0, done.stdout)
+
+    @unittest.skipUnless(shutil.which("clang") and shutil.which("llc"), "needs clang and llc")
+    def test_what_the_other_compiler_cannot_judge_is_no_difference(self):
+        self.source.write_text("#include <zrun.h>\nint main(void) { int i = 0x7FFF; i++; put_i16(i); return 0; }\n")
+        done = self.fuzz("cp $in $out", "--levels", "0", "--crosscheck")
+        self.assertEqual(done.returncode, 0, done.stdout)
+        self.assertIn("no crosscheck of right: it does what the language leaves open", done.stdout)
 
 
 class Generator(unittest.TestCase):

@@ -14,6 +14,7 @@ import tempfile
 from pathlib import Path
 
 HERE = Path(__file__).resolve().parent
+INCLUDE = HERE.parent.parent / "tools" / "include"
 
 # What the language leaves undefined stops a program here: a test must not rest on it.
 UNDEFINED = "signed-integer-overflow,shift,integer-divide-by-zero,bounds,float-cast-overflow,unreachable,return,null"
@@ -37,10 +38,45 @@ void put_f32(float); void put_f64(LONG_DOUBLE); void put_str(const char *);
 """
 
 
+class NotApplicable(Exception):
+    """The other compiler cannot judge the program: it refuses it, or the program does what the language leaves open."""
+
+
 def for_host(source):
     """The program's text with the target's char and double spelled in types of the other processor."""
     text = re.sub(r"#include <(zrun|string|stdlib|math|stdint)\.h>", "", source)
-    text = DECLARE + text
+    return respelled(DECLARE + text)
+
+
+def expanded(path):
+    """The text of a program with the target's headers in it, respelled. Strings become arrays of another type than the
+    program's, so it must not print any."""
+    words = ["cpp", "-std=c99", "-undef", "-nostdinc", "-P", "-D__wchar_t=int", "-isystem", INCLUDE, path]
+    done = subprocess.run(words, stdout=subprocess.PIPE, stderr=subprocess.PIPE, timeout=60)
+    if done.returncode != 0:
+        raise NotApplicable("the preprocessor refuses it")
+    text = respelled(done.stdout.decode())
+    if re.search(r"\bunion\b[^{};]*\{[^{}]*\*", text):
+        raise NotApplicable("a union holds a pointer")
+    text = re.sub(r"^\s*#\s*pragma\s+pack\b.*$", "", text, flags=re.M)  # which the target's parser does not know
+    return re.sub(r"\bchar\b", "short", text)
+
+
+def aligned(record):
+    """A structure whose wide members lie as the host aligns them: sizes of structures stand in the lowered form as
+    numbers of the other processor, and the host must mean the same."""
+    def member(found):
+        if re.search(r"long long|long double|u?int64_t", found[2]):
+            return f"{found[1]}__attribute__((aligned(8))) {found[2]};"
+        if re.search(r"\blong\b|\bfloat\b|\bdouble\b|u?int32_t", found[2]):
+            return f"{found[1]}__attribute__((aligned(4))) {found[2]};"
+        return found[0]
+
+    return record[1] + re.sub(r"([;{}]?\s*)([\w\s,\[\]]+);", member, record[2])
+
+
+def respelled(text):
+    text = re.sub(r"\b((?:struct|union)\s+\w*\s*\{)([^{}]*\})", aligned, text)
     text = re.sub(r"\blong\s+double\b", "LONG_DOUBLE", text)
     text = re.sub(r"\bdouble\b", "float", text).replace("LONG_DOUBLE", "double")
     if '"' not in re.sub(r"'\"'", "", text):
@@ -49,24 +85,50 @@ def for_host(source):
 
 
 def command(*words):
-    subprocess.run([str(word) for word in words], check=True)
+    done = subprocess.run([str(word) for word in words], stdout=subprocess.PIPE, stderr=subprocess.STDOUT, timeout=120)
+    if done.returncode != 0:
+        lines = done.stdout.decode("utf-8", "replace").splitlines()
+        raise NotApplicable(next((line for line in lines if "error:" in line), f"{words[0]}: {done.returncode}"))
 
 
-def printed(source, folder):
+def copies_pointers(form):
+    """Whether objects that hold pointers are copied or cleared as a whole, by their size with 16-bit pointers."""
+    types = dict(re.findall(r"^(%\S+) = type (.*)$", form, re.M))
+    holders = {name for name, body in types.items() if "*" in body}
+    while True:
+        more = {name for name, body in types.items() if holders & set(re.findall(r"%[\w.]+", body))} - holders
+        if not more:
+            break
+        holders |= more
+    return any(line[1].endswith("*]") or holders & set(re.findall(r"%(?:struct|union)[\w.]+", line[1]))
+               for line in re.finditer(r"bitcast \(?([^()\n]*)\* \S+ to i8\*", form))
+
+
+def printed(text, folder, seconds=60):
+    """What the program prints by the other compiler; `text` is for the host."""
     folder = Path(folder)
-    (folder / "p.c").write_text(for_host(source.read_text()))
+    (folder / "p.c").write_text(text)
     (folder / "print.c").write_text(PRINT)
     command("clang", "-target", "msp430", "-std=c99", "-w", "-O0", "-ffp-contract=off", "-fno-builtin", "-fsigned-char",
+            "-ffine-grained-bitfield-accesses", "-Xclang", "-cl-single-precision-constant", "-idirafter", INCLUDE,
             f"-fsanitize={UNDEFINED}", f"-fsanitize-trap={UNDEFINED}",
             "-S", "-emit-llvm", folder / "p.c", "-o", folder / "p.ll")
     form = (folder / "p.ll").read_text()
+    if copies_pointers(form):
+        raise NotApplicable("objects that hold pointers are copied")
     form = re.sub(r"^target (datalayout|triple).*$", "", form, flags=re.M)
     form = re.sub(r"^attributes .*$", lambda line: re.sub(r'"target-[a-z]+"="[^"]*"', "", line[0]), form, flags=re.M)
     (folder / "p.ll").write_text('target triple = "x86_64-pc-linux-gnu"\n' + form)
-    char = "short" if "char" not in (folder / "p.c").read_text() else "char"
+    char = "char" if re.search(r"\bchar\b", text) else "short"
     command("llc", "-O0", "-relocation-model=pic", "-filetype=obj", folder / "p.ll", "-o", folder / "p.o")
     command("clang", "-w", f"-DPUTCHAR={char}", folder / "print.c", folder / "p.o", "-lm", "-o", folder / "p")
-    return subprocess.run([folder / "p"], stdout=subprocess.PIPE, check=True, timeout=60).stdout.decode()
+    try:
+        done = subprocess.run([folder / "p"], stdout=subprocess.PIPE, timeout=seconds)
+    except subprocess.TimeoutExpired:
+        raise NotApplicable("it does not end") from None
+    if done.returncode < 0:
+        raise NotApplicable(f"it does what the language leaves open (signal {-done.returncode})")
+    return done.stdout.decode()
 
 
 def main():
@@ -79,8 +141,8 @@ def main():
         checked += 1
         try:
             with tempfile.TemporaryDirectory() as folder:
-                got = printed(source, folder).splitlines()
-        except subprocess.SubprocessError as error:
+                got = printed(for_host(source.read_text()), folder).splitlines()
+        except (NotApplicable, subprocess.SubprocessError) as error:
             got = [str(error)]
         want = source.with_suffix(".expected").read_text().splitlines()
         if got != want:

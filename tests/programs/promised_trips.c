@@ -1,4 +1,5 @@
 // Loops whose trips are promised by pragmas, at the least, the most, and between; requests for unrolling.
+#include <loops.h>
 #include <zrun.h>
 
 #define N 48
@@ -27,6 +28,15 @@ static long multiple_only(const int* p, int n) {
     int i;
 #pragma MUST_ITERATE(, , 8)
     for (i = 0; i < n; i++) s = s * 2 % 10007L + p[i];
+    return s;
+}
+
+// A minimum of 0 that is written down: the loop may not iterate at all.
+static long none_or_multiple(const int* p, int n) {
+    long s = 1;
+    int i;
+    MUST_ITERATE(0, , 4)
+    for (i = 0; i < n; i++) s = s * 3 % 10007L + p[i];
     return s;
 }
 
@@ -85,7 +95,8 @@ int main(void) {
     }
     for (i = 1; i < N; i += 23) put_i32(at_least_one(x, i));
     for (i = 4; i <= N; i += 20) put_i32(multiple_of_four(x, y, i));
-    for (i = 0; i <= N; i += 16) put_i32(multiple_only(x, i));
+    for (i = 16; i <= N; i += 16) put_i32(multiple_only(x, i));
+    for (i = 0; i <= N; i += 12) put_i32(none_or_multiple(x, i));
     for (i = 0; i < 10; i += 3) {
         unrolled(y, x, i);
         not_unrolled(y + 20, i);

@@ -78,6 +78,8 @@ def pragmas(rng, loop):
         most = rng.choice((loop.most, loop.most, loop.most + rng.randint(0, 20), ""))
         divisors = [d for d in (1, 2, 3, 4, 8, loop.multiple) if loop.multiple % d == 0]
         multiple = rng.choice((loop.multiple, rng.choice(divisors), ""))
+        if least == "" and multiple not in ("", 1) and loop.least == 0:
+            least = 0  # a multiple alone would promise an iteration
         # A least count that the multiple contradicts would be no lie, but nobody writes it.
         if least == "" or multiple == "" or least % multiple == 0:
             lines.append(f"#pragma MUST_ITERATE({least}, {most}, {multiple})".replace(", , )", ")").replace(", )", ")"))

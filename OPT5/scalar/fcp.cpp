@@ -1,7 +1,388 @@
-// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
-// meaning, and what is not known is assumed not to hold.
+// Fast constant and copy propagation: no data flow, one walk to count and one to rewrite.
+//
+// A local with one assignment in the whole function, to a value that is the same wherever it is evaluated, has that
+// value at every read that means anything: a read ahead of the assignment would see an undefined value. What must hold:
+//   - nothing but its NAME reaches the variable, no exception's clean-up code names it, it is not volatile;
+//   - the value reads no variable that changes once it was read. Of the NAMEs only those qualify that are assigned
+//   once,
+//     at the function's entry. An immutable variable of an inner block does not: it has another value each time round a
+//     loop, which a copy of it may outlive;
+//   - a string literal is one object, so that a pointer to one is moved, not copied.
+// All reads are replaced or none, so the assignment goes with the last of them. A value that itself names a variable
+// that is about to be replaced waits for the next round.
 #include "OPT5/scalar/fcp.h"
 
-void fast_CP(int, int) {}
-NODE* propagate_global_constants(NODE* tree) { return tree; }
-void combine_asgs_to_memory() {}
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/symbol_maps.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/simpcfg.h"
+#include "OPT5/simp/simp.h"
+#include "UTIL/abort.h"
+
+#include <unordered_map>
+#include <unordered_set>
+#include <vector>
+
+// ---- Globals that never change
+
+namespace {
+
+bool keeps_its_initial_value(const SYMTAB* sym) {
+    if (sym->level != 0 || !sym->type->is_scalar() || sym->type->is_volatile() || sym->type->is_complex()) return false;
+    if (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF) return false;
+    if (sym->dynamic_init || find_pragma(sym, PRG_WEAK)) return false;
+    if (symbol_is_immutable(sym)) return true;
+    constexpr unsigned USES = CQ_REFERENCED | CQ_WRITTEN | CQ_ALIASED;
+    return file_symbols_are_known && (sym->cqual & USES) == CQ_REFERENCED;
+}
+
+NODE* initial_value(const NODE* name) {
+    const SYMTAB* sym = name->u.sym;
+    if (name->type->is_volatile() || !keeps_its_initial_value(sym)) return nullptr;
+    NODE* value = sym->init_value ? copy_tree(sym->init_value) : lookup_autoinit(name);
+    if (!value) return nullptr;
+    if (expr_is_propagable(value, 2)) return coerce_to_type(name->type->stqs(), value);
+    erase_tree(value);
+    return nullptr;
+}
+
+} // namespace
+
+namespace {
+
+NODE* subst_globals(NODE* tree, bool* changed) {
+    if (!tree) return tree;
+    if (tree->op == NAME) {
+        NODE* value = tree->u.sym ? initial_value(tree) : nullptr;
+        if (!value) return tree;
+        *changed = true;
+        erase_tree(tree);
+        return value;
+    }
+    const bool left_is_place = opcode_is_ASG(tree->op) || tree->op == UAND || tree->op == ARGREF || tree->op == STDOT;
+    if (!left_is_place || (tree->left && tree->left->op != NAME)) tree->left = subst_globals(tree->left, changed);
+    tree->right = subst_globals(tree->right, changed);
+    return tree;
+}
+
+} // namespace
+
+NODE* propagate_global_constants(NODE* tree) {
+    bool changed = false;
+    return subst_globals(tree, &changed);
+}
+
+// ---- Values
+
+namespace {
+
+bool is_object_address(const NODE* t) {
+    if (t->op != UAND) return false;
+    const NODE* object = t->left;
+    while (object->op == STDOT) object = object->left;
+    return object->op == NAME;
+}
+
+} // namespace
+
+bool expr_is_propagable(const NODE* t, int uses) {
+    switch (t->op) {
+    case ICON:
+    case FCON: return true;
+    case SCON: return uses <= 1;
+    case UAND: return is_object_address(t);
+    case PLUS: return t->right->op == ICON && is_object_address(t->left);
+    case IDENTITY: return expr_is_propagable(t->left, uses);
+    case SCONV: return t->left->op != NAME && expr_is_propagable(t->left, uses);
+    case PCONV:
+    case ISP2CHAR: // an absolute address is dearer than a register; null is not
+        if (t->left->op == ICON) return t->left->u.lval.is_zero();
+        return expr_is_propagable(t->left, uses);
+    default: return false;
+    }
+}
+
+namespace {
+
+register_option pass_disable_fcprevsymtab("disable:fcprevsymtab");
+
+struct COUNTS {
+    int uses = 0;
+    int definitions = 0;
+    NODE* definition = nullptr; // the last ASG to the NAME that was counted
+    bool from_prolog = false;
+    bool at_entry = false; // that ASG is a statement that runs once
+    bool is_pinned = false;
+};
+
+bool is_automatic(const SYMTAB* sym) {
+    return sym->level == 2 && (sym->sclass == SC_AUTO || sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2);
+}
+
+bool is_plain_scalar(const TYPE* t) {
+    return (t->is_int() || t->is_enum() || t->is_float() || t->is_pointer()) && !t->is_volatile() && !t->is_vector();
+}
+
+// The NAME that a write goes to, wholly or in part; null where it goes through a pointer.
+NODE* written_name(NODE* t) {
+    while (t->op == STDOT || t->op == REAL || t->op == IMAG || t->op == VFIELD || t->op == SIMDHI || t->op == SIMDLO ||
+           t->op == VRCONV || t->op == DDNODE || t->op == IDENTITY)
+        t = t->left;
+    return t->op == NAME ? t : nullptr;
+}
+
+bool assigns(int op) { return opcode_is_ASG(op) || op == LOOP || op == INITLOOP || op == ENDLOOP; }
+
+class SWEEP {
+public:
+    SWEEP() { counts.max_load_factor(1.0); }
+    bool run(); // one round; true if it changed a statement
+    bool decided_a_branch = false;
+
+private:
+    void enter_symbols();
+    void count();
+    void count_tree(NODE* t);
+    void judge();
+    bool has_one_value(SYMTAB* sym, const COUNTS& c) const;
+    bool is_lasting_name(const NODE* t) const;
+    bool is_propagable(SYMTAB* sym, const COUNTS& c) const;
+    void keep_parameter(SYMTAB* sym, const COUNTS& c);
+    void rewrite();
+    bool rewrite_statement(LIST* s);
+    NODE* subst(NODE* t);
+    NODE* value_for(NODE* name);
+
+    std::unordered_map<const SYMTAB*, COUNTS> counts;
+    std::vector<SYMTAB*> symbols; // in the order of the lists
+    bool in_entry = false;        // the block being counted is entered once
+    bool in_prolog = false;
+    bool tree_changed = false;
+    bool changed = false;
+};
+
+// ---- Counting
+
+void SWEEP::enter_symbols() {
+    FUNINFO* f = currfuninfo;
+    for (SYMTAB* s = f->scalar_syms; s; s = s->next) {
+        OPT_ASSERT(s->level > 0);
+        symbols.push_back(s);
+    }
+    for (SYMTAB* s = f->memory_syms; s; s = s->next) symbols.push_back(s);
+    for (SYMTAB* s : symbols) counts[s];
+    for (const EHT_ITEM& item : f->eht)
+        for_each_node(item.cleanup, [this](const NODE* t) {
+            if (t->op == NAME) counts[t->u.sym].is_pinned = true;
+        });
+    for (SYMTAB* s : symbols) // the extent of an array is read where its block is entered
+        for_each_node(s->size_tree, [this](const NODE* t) {
+            if (t->op == NAME) counts[t->u.sym].is_pinned = true;
+        });
+}
+
+void SWEEP::count_tree(NODE* t) {
+    for (; t; t = t->left) {
+        if (t->op == NAME) {
+            ++counts[t->u.sym].uses;
+            return;
+        }
+        if (!assigns(t->op) || !t->left) {
+            count_tree(t->right);
+            continue;
+        }
+        count_tree(t->right);
+        NODE* name = written_name(t->left);
+        if (!name) continue;
+        COUNTS& c = counts[name->u.sym];
+        ++c.definitions;
+        c.definition = t->op == ASG && t->left == name ? t : nullptr;
+        c.from_prolog = in_prolog;
+        c.at_entry = in_entry;
+        if (c.definition) return;
+    }
+}
+
+void SWEEP::count() {
+    const BBLK* entry = currfuninfo->bb_list;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        in_entry = bb == entry && !bb->predecessors;
+        for (LIST* s = bb->statements; s; s = s->rest) {
+            in_prolog = tree_is_arg_prolog(s->first);
+            count_tree(s->first);
+        }
+    }
+}
+
+// ---- Judging
+
+bool SWEEP::has_one_value(SYMTAB* sym, const COUNTS& c) const {
+    return c.definitions == 1 && c.definition && !c.is_pinned && is_automatic(sym) && is_plain_scalar(sym->type) &&
+           !sym->is_aliased() && sym != currfuninfo->ret_by_cctor_sym && sym != currfuninfo->csu_return_sym;
+}
+
+// A variable that is given its value once, before anything can copy it, and keeps it to the end of the function.
+bool SWEEP::is_lasting_name(const NODE* t) const {
+    if (t->op != NAME || t->type->is_volatile()) return false;
+    auto it = counts.find(t->u.sym);
+    if (it == counts.end() || !has_one_value(t->u.sym, it->second)) return false;
+    return it->second.from_prolog || it->second.at_entry;
+}
+
+bool SWEEP::is_propagable(SYMTAB* sym, const COUNTS& c) const {
+    if (!has_one_value(sym, c) || c.from_prolog) return false;
+    const NODE* value = c.definition->right;
+    if (value->op == ASG) return false; // takes its turn once that is a statement
+    if (expr_is_propagable(value, c.uses)) return true;
+    // What `restrict` says holds for this variable alone.
+    if (sym->type->qual_kind(false) & QUAL_RESTRICT) return false;
+    while (value->op == PCONV && value->left->type->is_pointer()) value = value->left;
+    return is_lasting_name(value);
+}
+
+// A parameter that only the prolog sets stays what it is.
+void SWEEP::keep_parameter(SYMTAB* sym, const COUNTS& c) {
+    if (!c.from_prolog || !has_one_value(sym, c) || !map_sym_to_parm(sym) || symbol_is_immutable(sym)) return;
+    sym->type = tp->mk_qual(sym->type, QUAL_CONST);
+    if (print_debug) debug_printf("\n\tArgument variable is not re-assigned: %s\n", sym->name);
+}
+
+bool reads_name_of(const NODE* t, const std::unordered_set<const SYMTAB*>& set) {
+    if (t->op == UAND) return false;
+    if (t->op == NAME) return set.count(t->u.sym) != 0;
+    return (t->left && reads_name_of(t->left, set)) || (t->right && reads_name_of(t->right, set));
+}
+
+void SWEEP::judge() {
+    std::unordered_set<const SYMTAB*> candidates;
+    for (SYMTAB* s : symbols) {
+        const COUNTS& c = counts[s];
+        if (print_debug && !c.definitions && !c.uses)
+            debug_printf("\tNo references in the function for '%s'\n", s->name);
+        else if (print_debug && !c.definitions && is_automatic(s) && !is_internal_symbol(s))
+            debug_printf("\n\tVariable is used but never assigned: %s\n", s->name);
+        keep_parameter(s, c);
+        if (is_propagable(s, c)) candidates.insert(s);
+    }
+    for (SYMTAB* s : symbols) {
+        if (!candidates.count(s)) continue;
+        const NODE* value = counts[s].definition->right;
+        if (reads_name_of(value, candidates)) continue;
+        if (s->type->is_pointer() && !currfuninfo->spmap->is_bound(s)) currfuninfo->spmap->set_pointee(s, value);
+        currfuninfo->snmap->set_value(s, copy_tree(value));
+        if (print_debug)
+            debug_printf("\n\tGlobally constant assignment: %s = %s\n", s->name, tree_to_infix(value).c_str());
+    }
+}
+
+// ---- Rewriting
+
+NODE* SWEEP::value_for(NODE* name) {
+    NODE* value = currfuninfo->snmap->value(name->u.sym);
+    if (!value) return nullptr;
+    value = coerce_to_type(name->type->stqs(), value);
+    if (!value->ls) value->ls = name->ls;
+    return value;
+}
+
+// What a pointer that became an address points to is the object itself.
+NODE* access_by_name(NODE* t) {
+    if (trees_are_normalized || do_dd_for_be || t->right || t->left->op != UAND) return t;
+    NODE* object = t->left->left;
+    const bool is_same = (object->op == NAME || object->op == STDOT) && equiv_mtypes(object->type, t->type) &&
+                         object->type->is_scalar() && lvalue_is_volatile(object) == lvalue_is_volatile(t);
+    if (!is_same) return t;
+    erase_node(t->left);
+    erase_node(t);
+    return object;
+}
+
+NODE* SWEEP::subst(NODE* t) {
+    if (!t) return t;
+    if (t->op == NAME) {
+        NODE* value = value_for(t);
+        if (!value) return t;
+        tree_changed = true;
+        erase_tree(t);
+        return value;
+    }
+    if (t->op == UAND && t->left->op == NAME) return t;
+    if (assigns(t->op) && t->left && t->left->op == NAME) {
+        t->right = subst(t->right);
+        if (t->op != ASG || !currfuninfo->snmap->value(t->left->u.sym, true)) return t;
+        // All reads are replaced: of the assignment its value remains.
+        tree_changed = true;
+        NODE* value = coerce_to_type(t->left->type->stqs(), t->right);
+        erase_tree(t->left);
+        erase_node(t);
+        return value;
+    }
+    const bool was_access = t->op == UMULT && t->left && t->left->op != UAND;
+    t->left = subst(t->left);
+    t->right = subst(t->right);
+    return was_access ? access_by_name(t) : t;
+}
+
+bool is_decided(const NODE* t) { return (t->op == IF || t->op == SWITCH) && t->left && t->left->op == ICON; }
+
+// True if the statement is to go.
+bool SWEEP::rewrite_statement(LIST* s) {
+    if (tree_is_arg_prolog(s->first)) return false;
+    tree_changed = false;
+    const bool was_decided = is_decided(s->first);
+    s->first = subst(s->first);
+    if (opt_level() >= 2 && file_symbols_are_known) s->first = subst_globals(s->first, &tree_changed);
+    if (!tree_changed) return false;
+    changed = true;
+    if (!tree_is_ASM_comment(s->first)) s->first = peel_for_effect(simp_tree(s->first, nullptr));
+    if (!s->first) return true;
+    if (!was_decided && is_decided(s->first)) decided_a_branch = true;
+    promote_toplevel_COMMAOPs_in_list(s);
+    return false;
+}
+
+void SWEEP::rewrite() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST** link = &bb->statements; *link;) {
+            LIST* s = *link;
+            if (!rewrite_statement(s)) {
+                link = &s->rest;
+                continue;
+            }
+            *link = s->rest;
+            delete s;
+        }
+}
+
+bool SWEEP::run() {
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'fast_CP' -----------------\n");
+    FUNINFO* f = currfuninfo;
+    f->snmap->clear();
+    enter_symbols();
+    count();
+    judge();
+    if (!pass_disable_fcprevsymtab) f->scalar_syms = revsymtab(f->scalar_syms);
+    if (!f->snmap->empty() || (opt_level() >= 2 && file_symbols_are_known)) rewrite();
+    f->snmap->clear();
+    return changed;
+}
+
+} // namespace
+
+void fast_CP(int iterations, int combine) {
+    if (opt_level() == 0) return;
+    if (combine) combine_asgs_to_memory();
+    for (int left = iterations; left > 0; --left) {
+        sym_split(currfuninfo);
+        init_aliasing_info(true);
+        SWEEP sweep;
+        if (!sweep.run()) return;
+        if (!sweep.decided_a_branch) continue;
+        rebuildcfg();
+        simpcfg(0, 0);
+        if (left <= 2) return;
+    }
+}

@@ -104,14 +104,10 @@ def copies_pointers(form):
                for line in re.finditer(r"bitcast \(?([^()\n]*)\* \S+ to i8\*", form))
 
 
-def printed(text, folder, seconds=60):
-    """What the program prints by the other compiler; `text` is for the host."""
-    folder = Path(folder)
-    (folder / "p.c").write_text(text)
-    (folder / "print.c").write_text(PRINT)
+def executed(folder, char, seconds, words):
+    """What folder/p.c prints, lowered with these words too."""
     command("clang", "-target", "msp430", "-std=c99", "-w", "-O0", "-ffp-contract=off", "-fno-builtin", "-fsigned-char",
-            "-ffine-grained-bitfield-accesses", "-Xclang", "-cl-single-precision-constant", "-idirafter", INCLUDE,
-            f"-fsanitize={UNDEFINED}", f"-fsanitize-trap={UNDEFINED}",
+            "-Xclang", "-cl-single-precision-constant", "-idirafter", INCLUDE, *words,
             "-S", "-emit-llvm", folder / "p.c", "-o", folder / "p.ll")
     form = (folder / "p.ll").read_text()
     if copies_pointers(form):
@@ -119,7 +115,6 @@ def printed(text, folder, seconds=60):
     form = re.sub(r"^target (datalayout|triple).*$", "", form, flags=re.M)
     form = re.sub(r"^attributes .*$", lambda line: re.sub(r'"target-[a-z]+"="[^"]*"', "", line[0]), form, flags=re.M)
     (folder / "p.ll").write_text('target triple = "x86_64-pc-linux-gnu"\n' + form)
-    char = "char" if re.search(r"\bchar\b", text) else "short"
     command("llc", "-O0", "-relocation-model=pic", "-filetype=obj", folder / "p.ll", "-o", folder / "p.o")
     command("clang", "-w", f"-DPUTCHAR={char}", folder / "print.c", folder / "p.o", "-lm", "-o", folder / "p")
     try:
@@ -129,6 +124,17 @@ def printed(text, folder, seconds=60):
     if done.returncode < 0:
         raise NotApplicable(f"it does what the language leaves open (signal {-done.returncode})")
     return done.stdout.decode()
+
+
+def printed(text, folder, seconds=60):
+    """What the program prints by the other compiler; `text` is for the host. Looking for what is undefined makes units
+    of bit-fields as wide as can be, which the host lays out in its own way: that is a run of its own."""
+    folder = Path(folder)
+    (folder / "p.c").write_text(text)
+    (folder / "print.c").write_text(PRINT)
+    char = "char" if re.search(r"\bchar\b", text) else "short"
+    executed(folder, char, seconds, [f"-fsanitize={UNDEFINED}", f"-fsanitize-trap={UNDEFINED}"])
+    return executed(folder, char, seconds, ["-ffine-grained-bitfield-accesses"])
 
 
 def main():

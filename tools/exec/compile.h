@@ -151,8 +151,9 @@ private:
 
     // compile_parts.cpp: complex numbers and vectors
     const XNODE* parts(const IC_NODE* n);
-    const XNODE* lanes(const IC_NODE* n);
-    const XNODE* lane_operation(const IC_NODE* n, const SHAPE& a, const SHAPE& b, const SHAPE& to);
+    const XNODE* lanes(const IC_NODE* n, int opcode, const XNODE* left_value = nullptr);
+    const XNODE* lane_operation(int opcode, bool complex, const SHAPE& a, const SHAPE& b, const SHAPE& to);
+    const XNODE* update_lanes(const IC_NODE* n, int opcode);
 
     // compile_stmt.cpp
     void lay_out_frame();

@@ -253,6 +253,7 @@ const XNODE* COMPILER::assign(const IC_NODE* n) {
 const XNODE* COMPILER::compound(const IC_NODE* n, int opcode, bool before) {
     const IC_NODE* right = strip_marks(n->right);
     const SHAPE s = shape_of(n->type), sb = right ? shape_of(right->type) : int_shape(16, true);
+    if (s.rep == R_AGG && right && !before) return update_lanes(n, opcode);
     const XNODE* by = right ? value(right) : constant(1);
     LVALUE lv = lvalue(n->left);
     settle(lv);

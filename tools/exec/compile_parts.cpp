@@ -101,6 +101,22 @@ int64_t complex_equal(const XNODE* x, MACHINE& m) {
     return equal == (k.opcode == op::EQ || k.opcode == op::FEQ);
 }
 
+struct UPDATE {
+    const XNODE *address, *value;
+    uint32_t units;
+};
+int64_t updated_place(const XNODE*, MACHINE& m) { return static_cast<int64_t>(m.place); }
+int64_t update(const XNODE* x, MACHINE& m) {
+    const UPDATE& u = *static_cast<const UPDATE*>(x->extra);
+    const uint64_t outer = m.place, place = static_cast<uint64_t>(run(u.address, m));
+    m.place = place;
+    const uint64_t from = static_cast<uint64_t>(run(u.value, m));
+    m.place = outer;
+    m.check(place, u.units);
+    std::memmove(&m.memory[place], &m.memory[from], size_t{u.units} * 2);
+    return static_cast<int64_t>(place);
+}
+
 bool in_lanes(const TYPE* t) { return t && (t->is_complex() || t->is_vector()); }
 SHAPE lane_shape(TYPE* t) {
     if (!in_lanes(t)) return shape_of(t);
@@ -109,23 +125,23 @@ SHAPE lane_shape(TYPE* t) {
 } // namespace
 
 // An operator whose result, or one of whose operands, is a vector or a complex number.
-const XNODE* COMPILER::lanes(const IC_NODE* n) {
+// `left_value` stands for the left operand where that was computed already.
+const XNODE* COMPILER::lanes(const IC_NODE* n, int opcode, const XNODE* left_value) {
     const IC_NODE *left = strip_marks(n->left), *right = n->right ? strip_marks(n->right) : nullptr;
     TYPE* t = in_lanes(n->type) || !in_lanes(left->type) ? n->type : left->type;
-    const bool equality = n->op == op::EQ || n->op == op::NEQ || n->op == op::FEQ || n->op == op::FNEQ;
+    const bool equality = opcode == op::EQ || opcode == op::NEQ || opcode == op::FEQ || opcode == op::FNEQ;
     const bool complex = left->type->is_complex() || (right && right->type->is_complex()) || t->is_complex();
     if (equality && right && complex && !in_lanes(t)) t = right->type;
     if (!f || !in_lanes(t) || (complex ? !t->is_complex() : shape_of(n->type).rep != R_AGG)) return unsupported(n);
     LANES* k = p.make<LANES>();
-    k->opcode = n->op;
+    k->opcode = opcode;
     k->lane = lane_shape(t);
     k->count = complex ? 2 : t->real->num_elem();
-    auto source = [&](const IC_NODE* of) {
-        const bool scalar = !in_lanes(of->type);
-        return LANE_SOURCE{value(of), lane_shape(of->type), scalar, complex};
+    auto source = [&](const IC_NODE* of, const XNODE* x) {
+        return LANE_SOURCE{x ? x : value(of), lane_shape(of->type), !in_lanes(of->type), complex};
     };
-    k->a = source(left);
-    if (right) k->b = source(right);
+    k->a = source(left, left_value);
+    if (right) k->b = source(right, nullptr);
     const uint32_t units = k->a.lane.units * k->count;
     if (!k->a.scalar && units != shape_of(left->type).units) return unsupported(n);
     if (equality && complex) {
@@ -137,20 +153,20 @@ const XNODE* COMPILER::lanes(const IC_NODE* n) {
     k->slot = slot(uint64_t{k->count} * k->lane.units);
     XNODE* x = p.node(by_lanes);
     x->extra = k;
-    if (complex && (n->op == op::MULT || n->op == op::DIV)) {
+    if (complex && (opcode == op::MULT || opcode == op::DIV)) {
         if (!k->lane.is_float()) return unsupported(n);
         x->run = complex_product;
         return x;
     }
-    k->combine = lane_operation(n, k->a.lane, k->b.lane, k->lane);
+    k->combine = lane_operation(opcode, complex, k->a.lane, k->b.lane, k->lane);
     return k->combine ? x : unsupported(n);
 }
 
 // The operation on one lane of each operand.
-const XNODE* COMPILER::lane_operation(const IC_NODE* n, const SHAPE& a, const SHAPE& b, const SHAPE& to) {
+const XNODE* COMPILER::lane_operation(int opcode, bool complex, const SHAPE& a, const SHAPE& b, const SHAPE& to) {
     const XNODE *x = p.node([](const XNODE*, MACHINE&m) { return m.old_value; }),
                 *y = p.node([](const XNODE*, MACHINE&m) { return m.right_value; });
-    switch (n->op) {
+    switch (opcode) {
     case op::SCONV:
     case op::ACONV: return convert(x, a, to);
     case op::UMINUS:
@@ -159,8 +175,8 @@ const XNODE* COMPILER::lane_operation(const IC_NODE* n, const SHAPE& a, const SH
     case op::SQR:
     case op::SQRT:
     case op::RECIP: {
-        const EVAL e = unary_eval(n->op, a.rep);
-        const bool by_part = !n->type->is_complex() || n->op == op::UMINUS;
+        const EVAL e = unary_eval(opcode, a.rep);
+        const bool by_part = !complex || opcode == op::UMINUS;
         return e && by_part ? convert(p.node(e, x), a, to) : nullptr;
     }
     case op::PLUS:
@@ -172,16 +188,30 @@ const XNODE* COMPILER::lane_operation(const IC_NODE* n, const SHAPE& a, const SH
     case op::ORB:
     case op::XORB:
     case op::SLL:
-    case op::SRL: return arithmetic(n->op, x, a, y, b, to);
+    case op::SRL: return arithmetic(opcode, x, a, y, b, to);
     }
     return nullptr;
+}
+
+// The object is read, combined and written in one place; the address is computed once.
+const XNODE* COMPILER::update_lanes(const IC_NODE* n, int opcode) {
+    const LVALUE lv = lvalue(n->left);
+    loads++;
+    stores++;
+    UPDATE* u = p.make<UPDATE>();
+    u->address = address(lv);
+    u->value = lanes(n, opcode, p.node(updated_place));
+    u->units = lv.shape.units;
+    XNODE* x = p.node(update);
+    x->extra = u;
+    return x;
 }
 
 const XNODE* COMPILER::parts(const IC_NODE* n) {
     TYPE* t = n->type->real;
     const bool complex = n->op == op::COMPLEX && t->is_complex();
     const bool vector = (n->op == op::VPACK || n->op == op::VPACKM) && t->is_vector();
-    if (!complex && !vector) return lanes(n);
+    if (!complex && !vector) return lanes(n, n->op);
     if (!f) return unsupported(n);
     PACK* k = p.make<PACK>();
     k->lane = shape_of(complex ? t->part_type() : t->raw_elem_type());

@@ -19,6 +19,39 @@ def require_integer(node, where, what):
     return value
 
 
+def complex_items(node, type_, where):
+    """The constants of both parts of a static complex number; `node` is null for zero."""
+    value = 0j if node is None else _complex_number(node)
+    if value is None:
+        raise CompileError(where, "the initializer is not constant")
+    return [trees.floating(type_.part, part) for part in (value.real, value.imag)]
+
+
+def _complex_number(node):
+    """The value of a constant expression of complex type as the target holds it, or None."""
+    if node.op == Op.COMPLEX:
+        parts = _number(node.left), _number(node.right)
+        return None if None in parts else complex(*parts)
+    if node.op in (Op.SCONV, Op.UMINUS):
+        value = _complex_number(node.left) if T.is_complex(node.left.type) else None
+        if value is None:
+            return None
+        value = -value if node.op == Op.UMINUS else value
+    elif node.op in (Op.PLUS, Op.MINUS, Op.MULT):
+        a, b = _complex_number(node.left), _complex_number(node.right)
+        if a is None or b is None:
+            return None
+        part = T.strip(node.type).part
+        fit = lambda number: trees.round_to(part, number)
+        if node.op == Op.MULT:
+            value = complex(fit(a.real * b.real) - fit(a.imag * b.imag), fit(a.real * b.imag) + fit(a.imag * b.real))
+        else:
+            value = a + b if node.op == Op.PLUS else a - b
+    else:
+        return None
+    return complex(*(trees.round_to(T.strip(node.type).part, part) for part in (value.real, value.imag)))
+
+
 def _number(node):
     """int or float of an arithmetic constant expression, else None."""
     op = node.op

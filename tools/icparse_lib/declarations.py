@@ -61,7 +61,7 @@ class TypeBuilder:
                 if isinstance(known, T.Typedef):
                     return known
             if "_Complex" in node.names:
-                raise CompileError(where, "complex types are not supported")
+                return self._complex(node.names, where)
             return basic(node.names, where)
         if node in self.defined:
             return self.defined[node]
@@ -75,13 +75,25 @@ class TypeBuilder:
             self.defined[node] = type_
         return type_
 
+    @staticmethod
+    def _complex(names, where):
+        words = list(names)
+        words.remove("_Complex")
+        part = basic(words, where) if words else T.DOUBLE
+        if part not in (T.FLOAT, T.DOUBLE):  # the optimizer has no complex type of long double
+            raise CompileError(where, f"'{' '.join(names)}' is not supported")
+        return T.Complex(part)
+
     def _array(self, node, where):
         element = self.type_of(node.type)
         if T.is_function(element) or not element.complete:
             raise CompileError(where, f"array of '{element}'")
         if node.dim is None:
             return T.Array(element, None)
-        count = constants.require_integer(self.translator.expressions.value(node.dim), where, "the array size")
+        size = self.translator.expressions.value(node.dim)
+        if T.is_integer(size.type) and constants.integer_value(size) is None:
+            raise CompileError(where, "the array size is no constant; arrays of variable length are not supported")
+        count = constants.require_integer(size, where, "the array size")
         if count < 0:
             raise CompileError(where, "negative array size")
         return T.Array(element, count)

@@ -50,7 +50,7 @@ class Expressions:
         if not T.is_scalar(value.type) or not T.is_scalar(type_):
             raise CompileError(where, f"'{value.type}' cannot be assigned to '{type_}'")
         if T.is_pointer(type_) != T.is_pointer(value.type) and T.strip(type_).key != T.BOOL.key:
-            if T.is_floating(type_) or T.is_floating(value.type):
+            if not T.is_integer(type_) and not T.is_integer(value.type):
                 raise CompileError(where, f"'{value.type}' cannot be assigned to '{type_}'")
             if not trees.is_null_constant(value):
                 self.translator.warn(where, f"'{value.type}' assigned to '{type_}' without a cast")
@@ -281,12 +281,36 @@ class Expressions:
         found = self.scopes.find(name)
         if name == "__builtin_va_start" and len(arguments) == 2:
             return self._va_start(arguments, where)
+        if name == "__builtin_complex" and len(arguments) == 2:
+            return self._complex(arguments, where)
+        if name in ("__builtin_real", "__builtin_imag") and len(arguments) == 1:
+            return self._complex_part(Op.REAL if name == "__builtin_real" else Op.IMAG, arguments[0], where)
         if name in intrinsics.TABLE and (found is None or getattr(found, "klass", None) == Symbol.EXTERNAL):
             return self._intrinsic(intrinsics.TABLE[name], arguments, where)
         if found is None:
             self.translator.warn(where, f"function '{name}' is not declared")
             self.translator.declare_function(name, T.Function(T.INT, [], prototype=False), where)
         return None
+
+    def _complex(self, arguments, where):
+        """A complex number of two real ones."""
+        parts = [self.value(argument) for argument in arguments]
+        if not all(T.is_floating(part.type) for part in parts):
+            raise CompileError(where, "__builtin_complex takes two floating numbers")
+        type_ = T.usual(parts[0].type, parts[1].type)
+        if type_ == T.LDOUBLE:
+            raise CompileError(where, "'long double _Complex' is not supported")
+        return Node(Op.COMPLEX, T.Complex(type_), *(trees.convert(part, type_, where) for part in parts))
+
+    def _complex_part(self, op, argument, where):
+        value = self.value(argument)
+        if not T.is_arithmetic(value.type):
+            raise CompileError(where, f"'{value.type}' is no complex number")
+        if not T.is_complex(value.type):
+            value = operators.promoted(value, where)
+            part = T.strip(value.type) if T.is_floating(value.type) else T.DOUBLE
+            value = trees.convert(value, T.Complex(part), where)
+        return Node(op, T.strip(value.type).part, value)
 
     def _va_start(self, arguments, where):
         """The list starts right behind the last named parameter."""

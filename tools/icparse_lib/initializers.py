@@ -217,6 +217,8 @@ class Initializers:
                 return
             for index, member in enumerate(bare.members):
                 self._flatten(member.type, part.parts.get(index) if part else None, where, out)
+        elif isinstance(bare, T.Complex):
+            out += constants.complex_items(part, bare, where)
         elif part is None:
             out.append(trees.zero(bare))
         else:
@@ -324,6 +326,9 @@ class Image:
         elif isinstance(bare, T.Record):
             for member in bare.members[:1] if bare.is_union else bare.members:
                 self._walk(member.type, offset + member.offset, visit, member.width)
+        elif isinstance(bare, T.Complex):
+            visit(bare.part, offset, bare.part.size)
+            visit(bare.part, offset + bare.part.size, bare.part.size)
         else:
             visit(bare, offset, width or bare.size)
 

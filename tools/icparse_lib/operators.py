@@ -57,6 +57,8 @@ def _pointer_arithmetic(operator, left, right, where):
 
 def compare(operator, left, right, where):
     signed, unsigned = _COMPARE[operator]
+    if signed not in (Op.EQ, Op.NEQ) and (T.is_complex(left.type) or T.is_complex(right.type)):
+        raise _bad_operands(operator, left, right, where)
     if T.is_arithmetic(left.type) and T.is_arithmetic(right.type):
         left, right = promoted(left, where), promoted(right, where)
         common = T.usual(left.type, right.type)
@@ -183,6 +185,8 @@ def _in_place(operator, target, value):
         if not T.is_arithmetic(value.type):
             return None
         return own if T.usual(own, T.promote(value.type)).key == own.key else None
+    if isinstance(own, T.Complex):
+        return None
     own = T.as_integer(own)
     if own.kind == 0 or not T.is_integer(value.type):
         return None
@@ -219,7 +223,7 @@ def compound(operator, target, value, where, make_temporary):
 def increment(operator, postfix, target, where, make_temporary):
     """`++` and `--`, before or after their operand."""
     require_modifiable(target, where)
-    if not T.is_scalar(target.type):
+    if not T.is_scalar(target.type) or T.is_complex(target.type):
         raise CompileError(where, f"operator {operator} cannot take '{target.type}'")
     sign = operator[0]
     if not postfix or T.strip(target.type).key == T.BOOL.key:

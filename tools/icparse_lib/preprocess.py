@@ -20,7 +20,9 @@ CPP_ERROR = re.compile(r"^(.*?):(\d+):(\d+): (?:fatal )?error: (.*)$", re.M)
 BUILT_IN_NAMES = {"__wchar_t"}
 BUILT_IN_TYPES = "".join(f"typedef int {name};\n" for name in sorted(BUILT_IN_NAMES))
 
-PREDEFINED = ("__ZELKOVA__=1", "__signed__=signed", "__inline=inline", "__inline__=inline", "__restrict=restrict",
+# Attributes are read and mean nothing; pragmas say what they would.
+PREDEFINED = ("__attribute__(words)=", "__attribute(words)=",
+              "__ZELKOVA__=1", "__signed__=signed", "__inline=inline", "__inline__=inline", "__restrict=restrict",
               "__restrict__=restrict", "__const=const", "__volatile=volatile", "__extension__=",
               '__interrupt=_Pragma("INTERRUPT_NEXT")')
 

@@ -63,6 +63,9 @@ def zero(type_):
     """The zero of a scalar type."""
     if T.is_floating(type_):
         return floating(type_, 0.0)
+    if T.is_complex(type_):
+        part = zero(T.strip(type_).part)
+        return Node(Op.COMPLEX, T.strip(type_), part, part)
     if T.is_pointer(type_):
         return Node(Op.PCONV, T.unqualified(type_), integer(T.INT, 0))
     return integer(type_, 0)
@@ -164,6 +167,8 @@ def convert(node, type_, where):
         return node
     if not T.is_scalar(target) or not T.is_scalar(source):
         raise CompileError(where, f"cannot convert '{node.type}' to '{type_}'")
+    if isinstance(target, T.Complex) or isinstance(source, T.Complex):
+        return _convert_complex(node, target, source, where)
     if isinstance(target, T.Pointer):
         return _to_pointer(node, T.unqualified(type_), where)
     if isinstance(source, T.Pointer) and isinstance(target, T.Floating):
@@ -187,6 +192,17 @@ def convert(node, type_, where):
     return Node(Op.SCONV, target, node)
 
 
+def _convert_complex(node, target, source, where):
+    """Between complex types part by part; a real number has no imaginary part, and loses it."""
+    if isinstance(target, T.Complex):
+        if isinstance(source, T.Complex):
+            return Node(Op.SCONV, target, node)
+        return Node(Op.COMPLEX, target, convert(node, target.part, where), zero(target.part))
+    if target.key == T.BOOL.key:
+        return _to_bool(node)
+    return convert(Node(Op.REAL, source.part, node), target, where)
+
+
 def _convert_floating(node, target):
     value = float.fromhex(node.value)
     if isinstance(target, T.Floating):
@@ -200,7 +216,7 @@ def _convert_floating(node, target):
 def _to_pointer(node, type_, where):
     if T.is_pointer(node.type):
         return retype(node, type_)
-    if T.is_floating(node.type):
+    if not T.is_integer(node.type):
         raise CompileError(where, f"cannot convert '{node.type}' to '{type_}'")
     kind = T.as_integer(node.type)
     if not (is_integer_constant(node) and node.value == 0) and kind.size != 32:

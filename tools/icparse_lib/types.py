@@ -85,6 +85,21 @@ class Floating(Type):
         return self.NAMES[self.kind]
 
 
+class Complex(Type):
+    """A complex number of float or double: the real part, then the imaginary part."""
+    signed = True
+
+    def __init__(self, part):
+        self.part = part
+        self.key = ("complex", part.key)
+
+    size = property(lambda self: 2 * self.part.size)
+    align = property(lambda self: self.part.align)
+
+    def __str__(self):
+        return f"{self.part} _Complex"
+
+
 class Pointer(Type):
     size = align = 32
 
@@ -298,8 +313,12 @@ def is_floating(type_):
     return isinstance(strip(type_), Floating)
 
 
+def is_complex(type_):
+    return isinstance(strip(type_), Complex)
+
+
 def is_arithmetic(type_):
-    return isinstance(strip(type_), (Integer, Enum, Floating))
+    return isinstance(strip(type_), (Integer, Enum, Floating, Complex))
 
 
 def is_pointer(type_):
@@ -307,7 +326,7 @@ def is_pointer(type_):
 
 
 def is_scalar(type_):
-    return isinstance(strip(type_), (Integer, Enum, Floating, Pointer))
+    return isinstance(strip(type_), (Integer, Enum, Floating, Complex, Pointer))
 
 
 def is_void(type_):
@@ -351,6 +370,8 @@ def promote(type_, width=None):
 def usual(left, right):
     """The common type of two promoted arithmetic types."""
     left, right = (as_integer(t) if is_integer(t) else strip(t) for t in (left, right))
+    if is_complex(left) or is_complex(right):
+        return Complex(usual(*(t.part if is_complex(t) else t for t in (left, right))))
     if is_floating(left) or is_floating(right):
         return max((t for t in (left, right) if is_floating(t)), key=lambda t: t.kind)
     if left.kind == right.kind:

@@ -111,6 +111,8 @@ class TypeTable:
             return [type_.target]
         if isinstance(type_, T.Array):
             return [type_.element]
+        if isinstance(type_, T.Complex):
+            return [type_.part]
         if isinstance(type_, T.Function):
             return [type_.result, *type_.parameters]
         if isinstance(type_, (T.Qualified, T.Typedef)):
@@ -153,6 +155,8 @@ class TypeTable:
             return bytes([tag]) + flag(type_.explicit_sign) + extent + boolean + boolean
         if isinstance(type_, T.Floating):
             return bytes([10 + type_.kind]) + extent
+        if isinstance(type_, T.Complex):
+            return bytes([36]) + extent + self.number(type_.part)
         if isinstance(type_, T.Pointer):
             return bytes([15]) + self.number(type_.target) + extent
         if isinstance(type_, T.Qualified):

@@ -107,6 +107,10 @@ TEST_F(LanesTest, VectorArithmeticWrapsByLane) {
     put_lanes(w, {-9, -9, -9, -9});
     statement(set(a, node(PLUS, t, name(a), name(a))));
     put_lanes(a, {-2, -4, 600, 14});
+    // The right operand changes what the left one is afterwards, not what is updated.
+    statement(node(PLUSASG, t, name(a), node(PLUSASG, t, name(b), name(a))));
+    put_lanes(a, {-2, -5, 1500, 31});
+    put_lanes(b, {0, -1, 900, 17});
     ret(0);
     end();
     expect_output(expected);

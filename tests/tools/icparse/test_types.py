@@ -116,7 +116,8 @@ class WrongTypes(unittest.TestCase):
             ("int x; long x;", "t.c:1:13: error: conflicting declarations of 'x'"),
             ("enum { A, A };", "t.c:1:11: error: redefinition of 'A'"),
             ("long long unsigned float x;", "t.c:1:1: error: 'long long unsigned float' is not a type"),
-            ("int g(void); void f(void) { int v[g()]; }", "t.c:1:33: error: the array size is not an integer constant"),
+            ("int g(void); void f(void) { int v[g()]; }",
+             "t.c:1:33: error: the array size is no constant; arrays of variable length are not supported"),
         ]
         for text, expected in cases:
             with self.subTest(text):

@@ -13,6 +13,7 @@
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/md/matcher.h"
+#include "OPT5/scalar/eda.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 #include "OPT5/target/target.h"
@@ -46,6 +47,7 @@ bool optimize_unit(int argc, char** argv) {
     init_fileopts();
     init_BIF_descriptors();
     init_simplifier();
+    init_live_variables();
     setup_passes(true);
     if (pass_debug_parser) {
         parse_md_file(false);

@@ -59,7 +59,8 @@ I_SYMTAB* OPT_CLIENT::cl_symbol_create(const char* name, TYPE* type, TYPE* secon
     sym->written_as_parameter = lex == 1;
     if (retention == I_SYMTAB::RETENTION_KEEP) sym->cqual |= CQ_TOP;
     if (!file_level) {
-        sym->set_depnum(next_depnum++);
+        sym->order_of_reading = next_depnum++;
+        sym->set_depnum(sym->order_of_reading);
         switch (sclass) {
         case SC_AUTO:
         case SC_EXTDEF:

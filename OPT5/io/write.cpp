@@ -98,7 +98,8 @@ void write_parameters(FUNINFO* f) {
     for (SYMTAB* list : {f->scalar_syms, f->new_syms, f->pending_syms})
         for (SYMTAB* s = list; s; s = s->next)
             if (s->level == 1 && s->written_as_parameter) parms.push_back(s);
-    std::stable_sort(parms.begin(), parms.end(), [](const SYMTAB* a, const SYMTAB* b) { return a->depnum() < b->depnum(); });
+    std::stable_sort(parms.begin(), parms.end(),
+                     [](const SYMTAB* a, const SYMTAB* b) { return a->order_of_reading < b->order_of_reading; });
     for (SYMTAB* s : parms) write_symbol(s);
 }
 
@@ -118,7 +119,8 @@ void forget_indexes(FUNINFO* f) {
     for (SYMTAB* s : f->dropped_syms) s->index = -1;
 }
 
-template <class F> void for_each_tree(FUNINFO* f, F&& visit) {
+template <class F>
+void for_each_tree(FUNINFO* f, F&& visit) {
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
         for (LIST* s = bb->statements; s; s = s->rest) visit(s->first);
 }
@@ -315,13 +317,14 @@ void mark_names_of_initializers() {
 // Whether the definition may be dropped when nothing in the output needs it.
 void settle_retention(SYMTAB* s) {
     const bool is_function = s->is_function();
-    const bool candidate = is_function ? no_outside_callers || s->sclass == SC_STATIC
-                                       : no_outside_writers && s->sclass == SC_STATIC;
+    const bool candidate =
+        is_function ? no_outside_callers || s->sclass == SC_STATIC : no_outside_writers && s->sclass == SC_STATIC;
     if (s->retention == I_SYMTAB::RETENTION_KEEP) return;
     if (s->retention == I_SYMTAB::RETENTION_BY_USE && !candidate) return;
     if (is_function) {
         FUNINFO* f = make_FUNINFO(s);
-        constexpr uint64_t needed = FUN_is_referenced | FUN_is_processed | FUN_is_anonymous | FUN_is_interrupt | FUN_is_main;
+        constexpr uint64_t needed =
+            FUN_is_referenced | FUN_is_processed | FUN_is_anonymous | FUN_is_interrupt | FUN_is_main;
         if (function_is_defined(f) && !TEST_FLAG(f, needed)) s->retention = I_SYMTAB::RETENTION_DROP;
     } else if (!(s->cqual & CQ_REFERENCED)) {
         s->retention = I_SYMTAB::RETENTION_DROP;

@@ -91,7 +91,8 @@ void erase_edge(EDGE* edge);
 void erase_edge_list(EDGE* list);
 void connect(BBLK* from, BBLK* to);    // both lists; marks the dominators dirty
 void disconnect(BBLK* from, BBLK* to);
-BBLK* split_cfg_edge(BBLK* a, BBLK* b);
+// The new block. Without `renumber` the depth-first numbers are stale: for a caller that splits many edges.
+BBLK* split_cfg_edge(BBLK* a, BBLK* b, bool renumber = true);
 void split_critical_edges(bool all);
 bool bb_is_split_critical_edge(const BBLK* bb);
 // Answers and upkeep of the loop analysis for edge splitting; null while it does not run.

@@ -190,9 +190,9 @@ bool edge_may_stay(const BBLK* a, const BBLK* b) {
 
 } // namespace
 
-BBLK* split_cfg_edge(BBLK* a, BBLK* b) {
+BBLK* split_cfg_edge(BBLK* a, BBLK* b, bool renumber) {
     BBLK* n = make_block_on_edge(a, b);
-    renumber_bblocks();
+    if (renumber) renumber_bblocks();
     return n;
 }
 

@@ -89,6 +89,7 @@ public:
     uint32_t option_set = 0;
     SYMTAB* next = nullptr; // link of whichever symbol list holds it
     int64_t depnum_m = 0;
+    int64_t order_of_reading = 0; // of a symbol of a function; `depnum` starts as it and then belongs to the analyses
     uint16_t bitnum_m = 0;
     bool is_aliased_m = false;
     bool is_temp = false;

@@ -1,14 +1,43 @@
-// Dead assignments and live variables of a function.
+// Live variables, dead assignments, and assignments that stand inside expressions.
 #pragma once
 
+class BBLK;
 class FUNINFO;
+class NODE;
+class SYMTAB;
+struct LIST;
 
-// Removes assignments whose value no one reads; returns how many.
-int elim_dead_assigns(int keep_sets, int early);
+// ---- Live variables
+// What each set of a block is. They exist between `find_live_variables` and `lva_cleanup`, with
+// `FUNINFO::lva_sym_count` bits.
+enum LIVE_SET { LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF };
+constexpr int NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
 
-// Computes the live sets of all blocks, and frees them.
-void find_live_variables(int scalars_only, int with_memory);
+// Gives every local scalar that only its own NAME can reach a bit, `bitnum`, and computes the sets of all blocks.
+// `with_lifetimes` also counts the blocks that each is live in, in `depnum`. `mode` says who asks, for the debug
+// stream.
+void find_live_variables(int mode, bool with_lifetimes);
 void lva_cleanup();
+void init_live_variables(); // once: lets the dominator record ask for live sets
+// The bit of a symbol that is a candidate, or -1.
+int live_index(const SYMTAB* sym);
+
+// ---- Dead assignments
+// Removes assignments whose value no path reads, takes assignments out of expressions, and delays those that only one
+// way out of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments went.
+// `early` is given by all callers as 0 or by the propagation of constants as 1, and says that the graph may be
+// simplified at the end.
+int elim_dead_assigns(bool keep_embedded, bool early);
+// In the latch of `loop`: compound assignments to its counters whose value no one reads become plain arithmetic.
+void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop);
+// `x = e; y = x;` with `x` not read again becomes `y = e` in the first cell.
+bool combine_assignments(LIST* cell);
+// A destructor need not store to members that no later statement reads.
+void remove_unneeded_stores_from_destructor();
+
+// ---- Assignments inside expressions become statements of their own, in front of where they stood
+void promote_all_embedded_assignments();
+bool promote_embedded_assignments_in_bb(BBLK* bb); // whether it made any
 
 // Function-local statics that are written before they are read in every call become automatic variables.
 void identify_fl_statics_safe_for_auto();

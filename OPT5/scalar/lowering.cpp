@@ -11,7 +11,6 @@ void convert_sti_to_cinit() {}
 void build_stack_sharing_type() {}
 void subst_csu_returning_temp_for_local_var() {}
 void unsimplify() {}
-void promote_all_embedded_assignments() {}
 void expand_cluster_refs() {}
 void collect_clustered_symbols() {}
 void add_instrumentation_exit_routine_to_atexit() {}

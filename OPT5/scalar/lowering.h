@@ -22,9 +22,6 @@ void subst_csu_returning_temp_for_local_var();
 // Simplifier forms that the code generator does not want are undone.
 void unsimplify();
 
-// Assignments inside expressions become statements of their own.
-void promote_all_embedded_assignments();
-
 // References to clustered symbols; clustering is no part of this family.
 void expand_cluster_refs();
 void collect_clustered_symbols();

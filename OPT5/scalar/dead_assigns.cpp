@@ -1,0 +1,217 @@
+// Dead assignments: stores to a local that no path reads before the next store to it.
+//
+// One walk over each block against the order of evaluation, with the set of variables that are live at the point. What
+// a dead assignment computes stays for its effects. Variables that only die because an assignment went are found by the
+// next call: the sets of the other blocks are not recomputed, which leaves them too large and so safe.
+
+#include "OPT5/scalar/eda.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/delay.h"
+#include "OPT5/scalar/live_walk.h"
+#include "OPT5/scalar/simpcfg.h"
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
+
+#include <vector>
+
+namespace {
+
+// `y = x` where x is a candidate that is dead behind it.
+struct COPY {
+    LIST* cell = nullptr;
+    int from = -1; // the bits of x and y, -1 for a y that is no candidate
+    int to = -1;
+};
+
+bool is_combinable(const LIST* first, const LIST* second) {
+    const NODE *a = first->first, *b = second->first;
+    if (a->op != ASG || b->op != ASG || a->left->op != NAME || b->right->op != NAME ||
+        a->left->u.sym != b->right->u.sym)
+        return false;
+    if (tree_is_arg_prolog(a) || tree_is_arg_prolog(b) || lvalue_is_volatile(a->left)) return false;
+    if (sym_appears_in_tree(a->left->u.sym, b->left)) return false;
+    // The store goes where it went, after everything that the value takes.
+    return b->left->op == NAME || (!tree_has_side_effects(a->right) && !tree_has_side_effects(b->left));
+}
+
+class ELIMINATION final : public BACKWARD_WALK {
+public:
+    int count = 0;
+
+    void run(BBLK* bb) {
+        start_from_successors(bb);
+        *bb->live_sets[LIVE_OUT] = live;
+        std::vector<LIST*> cells;
+        for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
+        COPY copy;
+        bool kills = true, dropped = false;
+        for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
+            LIST* s = *it;
+            if (copy.cell && kills && s->rest == copy.cell && combine_assignments(s)) {
+                if (copy.to >= 0) live.set(static_cast<uint32_t>(copy.to));
+                live.clear(static_cast<uint32_t>(copy.from));
+                ++count;
+            }
+            copy = copy_at(s);
+            const bool is_dispatch = tree_is_EH_SWITCH(s->first);
+            statement(s->first, kills);
+            kills = !is_dispatch;
+            if (s->first) continue;
+            dropped = true;
+            copy.cell = nullptr;
+        }
+        if (dropped) unlink_empty_cells(bb);
+    }
+
+private:
+    void start_from_successors(const BBLK* bb) {
+        live = BITVEC(static_cast<uint32_t>(currfuninfo->lva_sym_count));
+        for (const EDGE* e = bb->successors; e; e = e->rest) {
+            if (const BITVEC* set = e->first->live_sets[LIVE_IN])
+                live |= *set;
+            else
+                live.set_all();
+        }
+    }
+
+    COPY copy_at(LIST* s) {
+        COPY copy;
+        const NODE* t = s->first;
+        if (t->op != ASG || t->right->op != NAME) return copy;
+        const int from = live_index(t->right->u.sym);
+        if (from < 0 || live.test(static_cast<uint32_t>(from))) return copy;
+        copy.to = t->left->op == NAME ? live_index(t->left->u.sym) : -1;
+        if (copy.to >= 0 && !live.test(static_cast<uint32_t>(copy.to))) return copy; // it goes
+        copy.cell = s;
+        copy.from = from;
+        return copy;
+    }
+
+    static void unlink_empty_cells(BBLK* bb) {
+        for (LIST** link = &bb->statements; *link;) {
+            LIST* s = *link;
+            if (s->first) {
+                link = &s->rest;
+                continue;
+            }
+            *link = s->rest;
+            delete s;
+        }
+    }
+
+    void read(int bit) override { live.set(static_cast<uint32_t>(bit)); }
+    bool write(int bit, bool kills) override {
+        if (!live.test(static_cast<uint32_t>(bit))) return false;
+        if (kills) live.clear(static_cast<uint32_t>(bit));
+        return true;
+    }
+    void removed() override { ++count; }
+
+    BITVEC live;
+};
+
+// A block that lost all but its jump lets the graph be smaller.
+bool some_block_only_jumps() {
+    for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
+        if (bb->statements && !bb->statements->rest && bb->statements->first->op == BRANCH) return true;
+    return false;
+}
+
+// A candidate that no tree names any more is no variable of the function any more.
+void drop_unreferenced_candidates() {
+    FUNINFO* f = currfuninfo;
+    BITVEC named(static_cast<uint32_t>(f->lva_sym_count));
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s; s = s->rest)
+            for_each_node(s->first, [&](const NODE* t) {
+                if (t->op != NAME) return;
+                if (int bit = live_index(t->u.sym); bit >= 0) named.set(static_cast<uint32_t>(bit));
+            });
+    for (SYMTAB** list : {&f->scalar_syms, &f->memory_syms})
+        for (SYMTAB** link = list; *link;) {
+            SYMTAB* s = *link;
+            const int bit = s->level == 2 ? live_index(s) : -1;
+            if (bit < 0 || named.test(static_cast<uint32_t>(bit))) {
+                link = &s->next;
+                continue;
+            }
+            *link = s->next;
+            s->next = nullptr;
+            f->dropped_syms.push_back(s);
+        }
+}
+
+} // namespace
+
+bool combine_assignments(LIST* cell) {
+    LIST* next = cell->rest;
+    if (!next || !next->rest || !is_combinable(cell, next)) return false;
+    NODE *first = cell->first, *second = next->first;
+    NODE* value = coerce_to_type(first->left->type, first->right, true);
+    first->right = nullptr;
+    erase_tree(first);
+    erase_tree(second->right);
+    second->right = coerce_to_type(second->left->type, value);
+    cell->first = simp_tree(second, nullptr);
+    cell->rest = next->rest;
+    delete next;
+    return true;
+}
+
+int elim_dead_assigns(bool keep_embedded, bool) {
+    FUNINFO* f = currfuninfo;
+    if (!f || !f->bb_list) return 0;
+    sym_split(f);
+    find_live_variables(1, true);
+    if (f->lva_sym_count == 0) return 0;
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'elim_dead_assigns' ----------\n");
+    ELIMINATION elimination;
+    BBLK* const entry = f->bb_list;
+    for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) elimination.run(bb);
+    if (elimination.count) drop_unreferenced_candidates();
+    bool graph_changed = false;
+    if (opt_level() > 0 && !keep_embedded) {
+        promote_all_embedded_assignments();
+        graph_changed = delay_assignments();
+        if (graph_changed) promote_all_embedded_assignments();
+    }
+    lva_cleanup();
+    if (!f->bb_list->loop && (graph_changed || (elimination.count && some_block_only_jumps()))) simpcfg(false, false);
+    return elimination.count;
+}
+
+// The counters of a loop and their kinds are known to the loop analysis; without it there is nothing to do.
+void elim_locally_dead_assignments_in_bb(BBLK*, struct LOOP*) {}
+
+namespace {
+
+const NODE* constant_mask(const NODE* t) { return t->op == ANDBASG && t->right->op == ICON ? t->right : nullptr; }
+
+bool clears_bits_of_the_same(const NODE* a, const NODE* b) {
+    if (!constant_mask(a) || !constant_mask(b) || !equiv_mtypes(a->right->type, b->right->type)) return false;
+    if (a->left->type->is_volatile() || tree_has_side_effects(a->left) || tree_has_side_effects(b->left)) return false;
+    return trees_are_congruent(a->left, b->left, false);
+}
+
+} // namespace
+
+void fold_ANDBASGs() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s && s->rest;) {
+            LIST* next = s->rest;
+            if (!clears_bits_of_the_same(s->first, next->first)) {
+                s = next;
+                continue;
+            }
+            NODE* mask = s->first->right;
+            mask->u.lval = truncate_to_type(mask->u.lval & next->first->right->u.lval, mask->type);
+            erase_tree(next->first);
+            s->rest = next->rest;
+            delete next;
+        }
+}

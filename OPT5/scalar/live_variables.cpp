@@ -1,0 +1,190 @@
+// Live variables of a function.
+//
+// A candidate is a local scalar that is read and written by its NAME alone: its address is not taken, it is not
+// volatile, and no exception entry names it. The sets are the least solution of
+//   live_out(b) = union of live_in(s) over the successors s,   live_in(b) = use(b) | (live_out(b) - def(b))
+// found by a worklist that starts with the last block in reverse postorder, so that an acyclic graph takes one visit a
+// block.
+
+#include "OPT5/scalar/live_walk.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/dominator.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
+#include "UTIL/abort.h"
+
+#include <vector>
+
+int live_index(const SYMTAB* sym) {
+    if (!sym || sym->level == 0) return -1;
+    const int n = sym->bitnum();
+    return n < currfuninfo->lva_sym_count ? n : -1;
+}
+
+namespace {
+
+bool is_candidate(const SYMTAB* sym) {
+    OPT_ASSERT(sym->level > 0);
+    switch (sym->sclass) {
+    case SC_AUTO:
+    case SC_REGISTER:
+    case SC_REGISTER2:
+    case SC_PARM: break;
+    default: return false;
+    }
+    if (sym->is_aliased() || sym->type->is_volatile() || !sym->type->is_scalar()) return false;
+    return !currfuninfo->has_eh() || !sym_appears_in_EHT(sym);
+}
+
+void number_candidates() {
+    FUNINFO* f = currfuninfo;
+    int count = 0;
+    for (SYMTAB* list : {f->scalar_syms, f->memory_syms})
+        for (SYMTAB* sym = list; sym; sym = sym->next) {
+            if (sym->level == 0) continue;
+            if (count == NOT_A_CANDIDATE || !is_candidate(sym)) {
+                sym->set_bitnum(NOT_A_CANDIDATE);
+                continue;
+            }
+            if (print_debug) debug_printf("\tLVA candidate %2d is variable '%s'\n", count, sym->name);
+            sym->set_bitnum(count++);
+        }
+    f->lva_sym_count = count;
+}
+
+// The control statement of the block stands behind every other one, so there is always a next cell to move up.
+void drop_statement(LIST* s) {
+    LIST* next = s->rest;
+    *s = *next;
+    delete next;
+}
+
+// A COMMAOP at the top of a statement is a sequence of statements.
+void split_statements() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s;) {
+            if (s->first->op != COMMAOP) {
+                s = s->rest;
+                continue;
+            }
+            NODE* comma = s->first;
+            NODE *first = peel_for_effect(comma->left), *second = peel_for_effect(comma->right);
+            comma->left = comma->right = nullptr;
+            erase_node(comma);
+            if (first && second) s->rest = mkelist(second, s->rest, s->psn);
+            s->first = first ? first : second;
+            if (!s->first) drop_statement(s);
+        }
+}
+
+class USE_DEF_WALK final : public BACKWARD_WALK {
+public:
+    USE_DEF_WALK(BITVEC* use_set, BITVEC* def_set) : use(use_set), def(def_set) {}
+
+private:
+    void read(int bit) override { use->set(static_cast<uint32_t>(bit)); }
+    bool write(int bit, bool kills) override {
+        if (kills) {
+            use->clear(static_cast<uint32_t>(bit));
+            def->set(static_cast<uint32_t>(bit));
+        }
+        return true;
+    }
+    BITVEC *use, *def;
+};
+
+void compute_use_and_def(BBLK* bb, uint32_t bits) {
+    for (int i : {LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF}) {
+        delete bb->live_sets[i];
+        bb->live_sets[i] = new BITVEC(bits);
+    }
+    USE_DEF_WALK(bb->live_sets[LIVE_USE], bb->live_sets[LIVE_DEF]).block(bb);
+}
+
+// Whether live_in grew.
+bool update(BBLK* bb) {
+    BITVEC& out = *bb->live_sets[LIVE_OUT];
+    for (const EDGE* e = bb->successors; e; e = e->rest) out |= *e->first->live_sets[LIVE_IN];
+    BITVEC in = out;
+    in -= *bb->live_sets[LIVE_DEF];
+    in |= *bb->live_sets[LIVE_USE];
+    if (in == *bb->live_sets[LIVE_IN]) return false;
+    *bb->live_sets[LIVE_IN] = in;
+    return true;
+}
+
+void solve() {
+    BBLK* const entry = currfuninfo->bb_list;
+    std::vector<BBLK*> work;
+    for (BBLK* bb = entry; bb; bb = bb->dflink) {
+        bb->visited = true; // waiting
+        work.push_back(bb);
+    }
+    while (!work.empty()) {
+        BBLK* bb = work.back();
+        work.pop_back();
+        bb->visited = false;
+        if (!update(bb)) continue;
+        for (const EDGE* e = bb->predecessors; e; e = e->rest) {
+            if (e->first->visited) continue;
+            e->first->visited = true;
+            work.push_back(e->first);
+        }
+    }
+}
+
+void note_lifetimes() {
+    FUNINFO* f = currfuninfo;
+    std::vector<int64_t> blocks(static_cast<size_t>(f->lva_sym_count), 0);
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
+        BITVEC live = *bb->live_sets[LIVE_IN];
+        live |= *bb->live_sets[LIVE_OUT];
+        for (uint32_t i = live.next_set(0); i < live.bits; i = live.next_set(i + 1)) ++blocks[i];
+    }
+    for (SYMTAB* list : {f->scalar_syms, f->memory_syms})
+        for (SYMTAB* sym = list; sym; sym = sym->next)
+            if (int n = live_index(sym); n >= 0) sym->set_depnum(blocks[static_cast<size_t>(n)]);
+}
+
+} // namespace
+
+void find_live_variables(int mode, bool with_lifetimes) {
+    (void)mode;
+    FUNINFO* f = currfuninfo;
+    if (!f || !f->bb_list) return;
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'find_live_variables' --------\n");
+    sym_split(f);
+    split_statements();
+    init_aliasing_info(false);
+    mark_aliased_vector_and_complex_symbols(false, true);
+    number_candidates();
+    if (f->lva_sym_count == 0) return;
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) compute_use_and_def(bb, static_cast<uint32_t>(f->lva_sym_count));
+    solve();
+    if (with_lifetimes) note_lifetimes();
+}
+
+void lva_cleanup() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (int i : {LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF}) {
+            if (!bb->live_sets[i]) continue;
+            if (bb->live_sets[i]->shared) {
+                bv_warn("Should not free a zoned bitvector");
+                continue;
+            }
+            delete bb->live_sets[i];
+            bb->live_sets[i] = nullptr;
+        }
+    currfuninfo->lva_sym_count = 0;
+}
+
+namespace {
+void for_dominators(int mode, int with_lifetimes) { find_live_variables(mode, with_lifetimes != 0); }
+} // namespace
+
+void init_live_variables() { find_live_variables_hook = for_dominators; }

@@ -1,0 +1,280 @@
+// Assignments inside expressions become statements of their own.
+//
+// The walk follows the order of evaluation, left operand first. An assignment may move in front of its statement if
+// nothing that stays behind and is evaluated before it has a side effect or reads what it writes; the first side effect
+// that stays ends the search in that statement. Parts that run under a condition are not opened.
+
+#include "OPT5/scalar/eda.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
+
+#include <vector>
+
+namespace {
+
+bool is_assignment(int op) { return op == ASG || op == PLUSPLUS || op == MINMIN || op_of_opASG[op] != ILLOP; }
+bool is_control(int op) { return op == IF || op == SWITCH || op == RETURN; }
+
+// Whether there is anything to do below the root.
+bool has_embedded(NODE* t) {
+    bool found = false;
+    auto visit = [&](const NODE* n) {
+        if (is_assignment(n->op) || n->op == COMMAOP) found = true;
+    };
+    for_each_node(t->left, visit);
+    for_each_node(t->right, visit);
+    return found;
+}
+
+int count_names(NODE* t, const SYMTAB* sym) {
+    int n = 0;
+    for_each_node(t, [&](const NODE* node) { n += node->op == NAME && node->u.sym == sym; });
+    return n;
+}
+
+class PROMOTER {
+public:
+    explicit PROMOTER(NODE* statement) : root(statement) {}
+
+    std::vector<NODE*> before, behind;
+
+    void run() {
+        switch (root->op) {
+        case IF:
+        case SWITCH:
+            if (root->left->op != ENDLOOP) root->left = value(root->left);
+            return;
+        case RETURN: root->right = value(root->right); return;
+        default: break;
+        }
+        if (is_assignment(root->op)) {
+            root->left = address(root->left);
+            evaluated.push_back(root->left);
+            root->right = value(root->right);
+        } else
+            operands(root);
+    }
+
+private:
+    // The parts of a written lvalue that are evaluated: not its own read.
+    NODE* address(NODE* lvalue) {
+        if (lvalue->op == UMULT || lvalue->op == STREF)
+            lvalue->left = value(lvalue->left);
+        else if (lvalue->op == STDOT)
+            lvalue->left = address(lvalue->left);
+        return lvalue;
+    }
+
+    void operands(NODE* t) {
+        t->left = value(t->left);
+        if (!t->right) return;
+        if (t->left) evaluated.push_back(t->left);
+        t->right = value(t->right);
+        if (t->left) evaluated.pop_back();
+    }
+
+    NODE* value(NODE* t) {
+        if (!t) return nullptr;
+        switch (t->op) {
+        case ANDAND:
+        case OROR:
+        case QUEST:
+            t->left = value(t->left);
+            if (tree_has_side_effects(t->right)) blocked = true;
+            return t;
+        case COMMAOP: return comma(t);
+        case PLUSPLUS:
+        case MINMIN: return increment(t);
+        case UAND:
+        case ARGREF: t->left = address(t->left); return t;
+        case NAME:
+        case UMULT:
+        case STREF:
+        case STDOT:
+            if (t->op != NAME) operands(t);
+            if (lvalue_is_volatile(t)) blocked = true;
+            return t;
+        default: break;
+        }
+        if (is_assignment(t->op)) return assignment(t);
+        operands(t);
+        if (side_effects[t->op]) blocked = true;
+        return t;
+    }
+
+    bool may_move_ahead(const NODE* t) const {
+        if (blocked) return false;
+        for (const NODE* p : evaluated)
+            if (tree_modifies_lvalue_in_tree(t, p)) return false;
+        return true;
+    }
+
+    NODE* assignment(NODE* t) {
+        t->left = address(t->left);
+        evaluated.push_back(t->left);
+        t->right = value(t->right);
+        evaluated.pop_back();
+        const bool is_variable = t->left->op == NAME;
+        const bool repeatable = !tree_has_side_effects(t->left) && !lvalue_is_volatile(t->left);
+        if (t->op != STASG && t->op != ARASG && repeatable && (is_variable || size_speed_goal() < 4) &&
+            may_move_ahead(t)) {
+            NODE* copy = copy_tree(t->left);
+            before.push_back(t);
+            return copy;
+        }
+        blocked = true;
+        return opASG_to_ASG(t);
+    }
+
+    NODE* comma(NODE* t) {
+        if (!effect(t->left)) {
+            blocked = true;
+            return t;
+        }
+        NODE* second = t->right;
+        t->left = t->right = nullptr;
+        erase_node(t);
+        return value(second);
+    }
+
+    // Moves what is evaluated for its effect alone ahead of the statement; false, and nothing moved, if it has to stay.
+    bool effect(NODE* t) {
+        switch (t->op) {
+        case COMMAOP:
+            // All or nothing: half of a chain would leave its order to the other half.
+            if (!is_movable_effect(t->left) || !is_movable_effect(t->right)) return false;
+            break;
+        default:
+            if (!is_movable_effect(t)) return false;
+        }
+        move_effect(t);
+        return true;
+    }
+
+    bool is_movable_effect(const NODE* t) const {
+        if (t->op == COMMAOP) return is_movable_effect(t->left) && is_movable_effect(t->right);
+        return t->op != QUEST && t->op != ANDAND && t->op != OROR && may_move_ahead(t);
+    }
+
+    void move_effect(NODE* t) {
+        if (t->op == COMMAOP) {
+            NODE *first = t->left, *second = t->right;
+            t->left = t->right = nullptr;
+            erase_node(t);
+            move_effect(first);
+            move_effect(second);
+            return;
+        }
+        if (NODE* rest = peel_for_effect(t)) before.push_back(rest);
+    }
+
+    NODE* increment(NODE* t) {
+        NODE* x = t->left;
+        if (x->op != NAME || !x->type->is_scalar() || lvalue_is_volatile(x) || t->right->op != ICON) {
+            x = t->left = address(x);
+            blocked = true;
+            return t;
+        }
+        if (!is_control(root->op) && !x->u.sym->is_aliased() && x->u.sym->level == 2 &&
+            count_names(root, x->u.sym) == 1) {
+            behind.push_back(step(t));
+            t->left = nullptr;
+            erase_tree(t);
+            return x;
+        }
+        if (!may_move_ahead(t)) {
+            blocked = true;
+            return t;
+        }
+        return x->type->is_int() && !x->type->is_ikind(TYPE::ik_bool) ? undone_step(t) : saved_value(t);
+    }
+
+    static NODE* step(const NODE* t) {
+        return maketree(t->op == PLUSPLUS ? PLUSASG : MINUSASG, copy_tree(t->left), copy_tree(t->right), t->left->type,
+                        t->ls);
+    }
+
+    // In arithmetic that wraps at the variable's width the old value is one step back from the new.
+    NODE* undone_step(NODE* t) {
+        before.push_back(step(t));
+        TYPE* type = t->left->type;
+        NODE* old = maketree(t->op == PLUSPLUS ? MINUS : PLUS, t->left, coerce_to_type(type, t->right), type, t->ls);
+        t->left = t->right = nullptr;
+        erase_node(t);
+        return simp_node(old, nullptr);
+    }
+
+    NODE* saved_value(NODE* t) {
+        SYMTAB* temp = sym_temp('T', -1, t->left->type, nullptr);
+        temp->set_bitnum(NOT_A_CANDIDATE);
+        before.push_back(mk_ASG(mk_NAME(temp), copy_tree(t->left)));
+        before.push_back(step(t));
+        erase_tree(t);
+        return mk_NAME(temp);
+    }
+
+    NODE* root;
+    std::vector<const NODE*> evaluated; // what stays and is evaluated before the place of the walk
+    bool blocked = false;               // a side effect among it
+};
+
+bool is_left_alone(const NODE* t) {
+    switch (t->op) {
+    case ASM:
+    case PPRAGMA:
+    case BRANCH:
+    case URETURN:
+    case LABELDEF:
+    case LOOP:
+    case ASSERT:
+    case NASSERT:
+    case PCOMMA: return true;
+    default: return tree_is_EH_SWITCH(t) || tree_is_arg_prolog(t);
+    }
+}
+
+// Puts the statements around `s`, whose cell keeps its place at the end of what comes before it. The last cell.
+LIST* insert_around(LIST** link, LIST* s, const PROMOTER& promoter) {
+    for (NODE* t : promoter.before) {
+        *link = mkelist(t, s, s->psn);
+        link = &(*link)->rest;
+    }
+    LIST* last = s;
+    for (NODE* t : promoter.behind) last = last->rest = mkelist(t, last->rest, s->psn);
+    return last;
+}
+
+} // namespace
+
+bool promote_embedded_assignments_in_bb(BBLK* bb) {
+    bool changed = false;
+    for (LIST** link = &bb->statements; *link;) {
+        LIST* s = *link;
+        // What an exception may leave in its middle stays one statement.
+        const bool may_be_left = s->rest && tree_is_EH_SWITCH(s->rest->first);
+        if (may_be_left || is_left_alone(s->first) || !has_embedded(s->first)) {
+            link = &s->rest;
+            continue;
+        }
+        PROMOTER promoter(s->first);
+        promoter.run();
+        LIST* last = insert_around(link, s, promoter);
+        changed |= !promoter.before.empty() || !promoter.behind.empty();
+        link = &last->rest;
+    }
+    return changed;
+}
+
+void promote_all_embedded_assignments() {
+    if (!currfuninfo->bb_list) return;
+    init_aliasing_info(false);
+    bool changed = false;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) changed |= promote_embedded_assignments_in_bb(bb);
+    if (changed) sym_split(currfuninfo);
+}

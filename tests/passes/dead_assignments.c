@@ -1,0 +1,106 @@
+// Assignments that no path reads go, what they compute stays for its effects; assignments in expressions stand alone.
+// RUN: --opt_level=1 --disable_inlining
+#include <zrun.h>
+
+int g;
+volatile int v;
+static int step(int by) { return g += by; }
+
+// FUNCTION: overwritten
+// COUNT 0: = 1
+// HAS: /x = y \+ 2|return/
+int overwritten(int y) {
+    int x = 1;
+    g = y;
+    x = y + 2;
+    return x * g;
+}
+
+// FUNCTION: effects
+// COUNT 1: _step(
+// COUNT 1: /_v/
+// COUNT 0: unused
+void effects(void) {
+    int unused = step(3);
+    unused = v;
+    unused += 4;
+}
+
+// FUNCTION: on_one_way
+// HAS: /if .*goto/
+// HAS: /x = .*y \* 3/
+// HAS: /L\d+:/
+int on_one_way(int y) {
+    int x = y * 3;
+    if (y > 100) {
+        g = x;
+        return 1;
+    }
+    g = y;
+    return 2;
+}
+
+// FUNCTION: conditional
+// HAS: x = 5
+int conditional(int y) {
+    int x = 5;
+    y > 3 && (x = y);
+    g = y;
+    return x;
+}
+
+static void look(const int *p) { g += *p; }
+
+// FUNCTION: address_taken
+// HAS: x = 7
+// HAS: x = y
+int address_taken(int y) {
+    int x;
+    x = 7;
+    look(&x);
+    x = y;
+    look(&x);
+    return y;
+}
+
+// FUNCTION: volatile_local
+// COUNT 2: x = 
+void volatile_local(void) {
+    volatile int x;
+    x = 1;
+    x = 2;
+}
+
+// FUNCTION: embedded
+// COUNT 0: /\(.*= 3\)/
+int embedded(int y) {
+    int x;
+    y = (x = 3) + g;
+    g = x;
+    return y * x;
+}
+
+// FUNCTION: old_value
+// COUNT 0: /\+\+/
+int old_value(int y) {
+    g = y;
+    return y++ * 2 + g + step(y);
+}
+
+// FUNCTION: not_past_a_read
+// HAS: /\(g|_g.*_step\(1\)/
+int not_past_a_read(void) { return g + step(1); }
+
+int main(void) {
+    put_i16(overwritten(4));
+    effects();
+    put_i16(g);
+    put_i16(on_one_way(101) + on_one_way(5));
+    put_i16(conditional(4) * 10 + conditional(3));
+    put_i16(address_taken(9));
+    volatile_local();
+    put_i16(embedded(8));
+    put_i16(old_value(6));
+    put_i16(not_past_a_read());
+    return 0;
+}

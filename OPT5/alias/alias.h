@@ -91,7 +91,7 @@ bool may_be_an_internal_lvalue(const NODE* tree);
 SYMTAB* get_vector_or_complex_symbol(const NODE* tree); // the vector or complex variable that an lvalue is part of
 bool is_an_array_reference(const NODE* lvalue);
 
-// ---- Alignment in bits of an access, of which 0 is never given
+// ---- Known alignment in bits, 16 at the least
 unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop);
-unsigned nonaligned_pointee_alignment(const NODE* pointer, struct LOOP* loop); // less what NONALIGN takes back
+unsigned nonaligned_pointee_alignment(const NODE* pointer, struct LOOP* loop); // not trusting the pointer's own type
 unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop);

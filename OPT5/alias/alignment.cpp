@@ -1,0 +1,67 @@
+// The known alignment of an access: that of the object or of what its pointer was declared to point to, as far as the
+// offsets added to it keep it. The wrappers OUIALIGN and NONALIGN take back what a pointer's type promises.
+#include "OPT5/alias/alias.h"
+
+#include "OPT5/alias/address_form.h"
+#include "OPT5/ir/symtab.h"
+#include "OPT5/ir/trees.h"
+
+#include <algorithm>
+
+namespace {
+
+constexpr unsigned UNIT = 16; // bits; what every address is aligned to
+
+unsigned at_least_a_unit(INT65 bits) {
+    constexpr unsigned LIMIT = 1u << 16;
+    if (bits < INT65(UNIT)) return UNIT;
+    return bits > INT65(LIMIT) ? LIMIT : bits.fits_in<unsigned>();
+}
+
+unsigned alignment_of(const TYPE* type) { return std::max(UNIT, type->align); }
+
+unsigned type_promise(const NODE* pointer) {
+    return pointer->type->is_pointer() ? alignment_of(pointer->type->type_pointed_to()) : UNIT;
+}
+
+bool is_marked_unaligned(const NODE* pointer) {
+    while (pointer->op == PCONV || pointer->op == ISP2CHAR || pointer->op == IDENTITY) pointer = pointer->left;
+    return pointer->op == OUIALIGN || pointer->op == NONALIGN;
+}
+
+// Of the place that a form stands for, down to one unit. `trusted`: pointers in it have the alignment of their types.
+unsigned alignment_of_form(const ADDRESS_FORM& form, bool trusted) {
+    INT65 g = form.offset.is_negative() ? -form.offset : form.offset;
+    if (form.object) g = long_gcd(g, INT65(std::max(form.object->align, alignment_of(form.object->type))));
+    for (const ADDRESS_TERM& term : form.terms) {
+        const INT65 scale = term.coefficient.is_negative() ? -term.coefficient : term.coefficient;
+        const bool is_base = term.tree->type->is_pointer() && scale == INT65(UNIT);
+        g = long_gcd(g, is_base && trusted ? INT65(type_promise(term.tree)) : scale);
+    }
+    return at_least_a_unit(g);
+}
+
+unsigned alignment_of_address(const NODE* pointer) {
+    NODE* place = maketree(UMULT, copy_tree(pointer), nullptr, pointer->type->type_pointed_to());
+    const unsigned bits = alignment_of_form(address_form(place), !is_marked_unaligned(pointer));
+    erase_tree(place);
+    return bits;
+}
+
+} // namespace
+
+unsigned nonaligned_pointee_alignment(const NODE* pointer, struct LOOP*) {
+    return pointer->type->is_pointer() ? alignment_of_address(pointer) : UNIT;
+}
+
+unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop) {
+    const unsigned known = nonaligned_pointee_alignment(pointer, loop);
+    return is_marked_unaligned(pointer) ? known : std::max(known, type_promise(pointer));
+}
+
+unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop) {
+    const NODE* t = lvalue;
+    while (t->op == IDENTITY || t->op == DDNODE || (t->op >= SSA_USE && t->op <= SSA_CHI)) t = t->left;
+    if (t->op == UMULT && !t->right) return pointee_alignment(t->left, loop);
+    return alignment_of_form(address_form(t), true);
+}

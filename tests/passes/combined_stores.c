@@ -1,0 +1,154 @@
+// Two assignments in a row to one object in memory become one, unless something could see the first.
+// RUN: --opt_level=1
+#include <zrun.h>
+
+int g, h, *gp = &g;
+unsigned u;
+long wide;
+float real;
+volatile int port;
+struct pair {
+    int a, b;
+    int field : 5;
+} s;
+
+// FUNCTION: overwritten
+// COUNT 1: _s.a =
+// HAS: _s.a = 2
+void overwritten(void) {
+    s.a = 1;
+    s.a = 2;
+}
+
+// FUNCTION: read_between
+// HAS: _g = n * 2 + 1
+void read_between(int n) {
+    g = n;
+    g = g * 2 + 1;
+}
+
+// FUNCTION: steps
+// HAS: _g += 7
+// HAS: _u += (unsigned int)n + 5
+// HAS: _wide = (_wide + (long)n) * 3
+void steps(int n) {
+    g += 3;
+    g += 4;
+    u += (unsigned)n;
+    u += 5;
+    wide += n;
+    wide *= 3;
+}
+
+// FUNCTION: bits
+// HAS: _g &= n & 15
+void bits(int n) {
+    g &= n;
+    g &= 15;
+}
+
+// FUNCTION: temporary
+// COUNT 1: _g =
+// HAS: /^\$O\$T\d+ = n \* 5/
+void temporary(int n) {
+    g = n * 5;
+    g = g * g;
+}
+
+// What is added may overflow, or round, where no step of the sum does.
+// FUNCTION: sums_that_overflow_alone
+// HAS: _g = _g + n + m
+// HAS: _wide = _wide + (long)n + (long)m
+// HAS: /^_real = _real \+ \S+ \+ \S+$/
+void sums_that_overflow_alone(int n, int m) {
+    g += n;
+    g += m;
+    wide += n;
+    wide += m;
+    real += 0.1f;
+    real += 0.2f;
+}
+
+// FUNCTION: seen_by_pointer
+// HAS: _g = 1
+// HAS: _g = *_gp + 1
+void seen_by_pointer(void) {
+    g = 1;
+    g = *gp + 1;
+}
+
+// FUNCTION: through_a_pointer
+// COUNT 1: *_gp =
+// HAS: *_gp = 4
+void through_a_pointer(void) {
+    *gp = 3;
+    *gp = 4;
+}
+
+// The first store may change where the second goes.
+struct node {
+    struct node* next;
+    int value;
+} n1, n2, *head = &n1;
+
+// FUNCTION: moved_target
+// COUNT 2: next =
+void moved_target(void) {
+    head->next->next = &n2;
+    head->next->next = &n1;
+}
+
+// FUNCTION: watched
+// COUNT 2: _port =
+void watched(void) {
+    port = 1;
+    port = 2;
+}
+
+// FUNCTION: fields
+// COUNT 2: _s.field =
+void fields(void) {
+    s.field = 1;
+    s.field = 2;
+}
+
+static int change(void) { return g++; }
+// FUNCTION: calls_stay
+// HAS: _g = 1
+// HAS: _g = _change()
+void calls_stay(void) {
+    g = 1;
+    g = change();
+}
+
+int main(void) {
+    overwritten();
+    read_between(4);
+    put_i16(g);
+    steps(9);
+    bits(13);
+    put_i16(g);
+    put_i32(wide);
+    put_i16(u);
+    temporary(6);
+    put_i16(g);
+    sums_that_overflow_alone(-20000, 30000);
+    put_i16(g);
+    put_i32(wide);
+    put_i16(real * 10);
+    seen_by_pointer();
+    put_i16(g);
+    through_a_pointer();
+    put_i16(g);
+    n1.next = &n1;
+    n2.next = &n2;
+    moved_target();
+    put_i16(n1.next == &n2);
+    put_i16(n2.next == &n1);
+    watched();
+    fields();
+    put_i16(s.field + s.a);
+    calls_stay();
+    put_i16(g);
+    return 0;
+}

@@ -100,7 +100,7 @@ def copies_pointers(form):
         if not more:
             break
         holders |= more
-    return any(line[1].endswith("*]") or holders & set(re.findall(r"%(?:struct|union)[\w.]+", line[1]))
+    return any(line[1][0] == "[" and line[1].rstrip("]").endswith("*") or holders & set(re.findall(r"%(?:struct|union)[\w.]+", line[1]))
                for line in re.finditer(r"bitcast \(?([^()\n]*)\* \S+ to i8\*", form))
 
 

@@ -6,6 +6,7 @@
 #define _CSMITH_H
 
 #include <stdint.h>
+#include <stdio.h>
 #include <string.h>
 #include <zrun.h>
 

@@ -100,8 +100,9 @@ def copies_pointers(form):
         if not more:
             break
         holders |= more
-    return any(line[1][0] == "[" and line[1].rstrip("]").endswith("*") or holders & set(re.findall(r"%(?:struct|union)[\w.]+", line[1]))
-               for line in re.finditer(r"bitcast \(?([^()\n]*)\* \S+ to i8\*", form))
+    copied = set(re.findall(r"bitcast \(?([^()\n]*)\* \S+ to i8\*", form))
+    return any(type_[0] == "[" and type_.rstrip("]").endswith("*") or
+               holders & set(re.findall(r"%(?:struct|union)[\w.]+", type_)) for type_ in copied)
 
 
 def executed(folder, char, seconds, words):

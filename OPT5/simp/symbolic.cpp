@@ -1,8 +1,13 @@
-// Signs, zero and single values: what the bounds and the known bits of a tree say.
+// Signs, zero, single values and overflow, by bounds, known bits and linear forms.
 
 #include "OPT5/simp/symbolic.h"
 
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/linear.h"
+#include "OPT5/simp/range.h"
+#include "OPT5/target/bif.h"
 
 #include <numeric>
 
@@ -10,78 +15,155 @@ LOOP_SEAMS loop_seams;
 
 namespace {
 
-bool is_integer(const TYPE* t) { return (t->is_int() || t->is_enum()) && t->size >= 1 && t->size <= 64; }
-uint64_t sign_bit(const TYPE* t) { return uint64_t(1) << (t->size - 1); }
-bool is_signed(const TYPE* t) { return !t->is_bool() && !t->is_unsigned(); }
+constexpr int MOST_LEVELS = 4; // of operators that are looked through for a value other than zero
+
+// A product beyond so many levels of questions about products counts as one that may overflow.
+constexpr int MOST_PRODUCT_LEVELS = 8;
+thread_local int product_levels = 0;
+
+bool is_plain_conversion(const NODE* t) {
+    return t->op == SCONV && has_value_range(t->left->type) &&
+           (t->type->is_bool() || t->type->size >= t->left->type->size);
+}
+
+// By form: what keeps a value other than zero as one.
+bool is_non_zero(const NODE* t, struct LOOP* loop, int levels) {
+    t = without_wrappers(t);
+    if (!has_value_range(t->type)) return false;
+    if (!range_of_tree(t, loop).holds(0) || known_bits(t).ones) return true;
+    if (levels == 0) return false;
+    auto operand = [&](const NODE* n) { return is_non_zero(n, loop, levels - 1); };
+    switch (t->op) {
+    case UMINUS:
+    case ABS: return has_value_range(t->left->type) && t->left->type->size == t->type->size && operand(t->left);
+    case SCONV: return is_plain_conversion(t) && operand(t->left);
+    case ORB:
+        return t->left->type->size == t->type->size && t->right->type->size == t->type->size &&
+               (operand(t->left) || operand(t->right));
+    case MULT: return operand(t->left) && operand(t->right) && !expr_product_may_overflow(t, loop);
+    case QUEST:
+        return t->right->op == COLON && t->right->left->type->size <= t->type->size &&
+               t->right->right->type->size <= t->type->size && operand(t->right->left) && operand(t->right->right);
+    case COMMAOP: return t->right->type->size <= t->type->size && operand(t->right);
+    case MINUS:
+    case XORB: return tree_values_are_not_equal(t->left, t->right, loop);
+    default: return false;
+    }
+}
 
 } // namespace
 
-bool calculate_bounds(const NODE* tree, struct LOOP*, INT65* min, INT65* max) {
-    if (!is_integer(tree->type)) return false;
-    *min = int_type_min(tree->type);
-    *max = int_type_max(tree->type);
-    return true;
+// ---- Sign and zero
+
+bool tree_is_non_negative(const NODE* tree, struct LOOP* loop) {
+    if (!has_value_range(tree->type)) return false;
+    return range_of_type(tree->type).min >= 0 || range_of_tree(tree, loop).min >= 0;
 }
 
-INT65 calculate_minval_for_tree(const NODE* tree, struct LOOP* loop) {
-    INT65 min, max;
-    return calculate_bounds(tree, loop, &min, &max) ? min : int_type_min(tp->llong_t);
-}
-
-INT65 calculate_maxval_for_tree(const NODE* tree, struct LOOP* loop) {
-    INT65 min, max;
-    return calculate_bounds(tree, loop, &min, &max) ? max : int_type_max(tp->ullong_t);
-}
-
-bool tree_is_non_negative(const NODE* tree, struct LOOP*) {
-    if (!is_integer(tree->type)) return false;
-    return !is_signed(tree->type) || (known_bits(tree).zeros & sign_bit(tree->type)) != 0;
-}
-
-bool tree_is_negative(const NODE* tree, struct LOOP*) {
-    return is_integer(tree->type) && is_signed(tree->type) && (known_bits(tree).ones & sign_bit(tree->type)) != 0;
+bool tree_is_negative(const NODE* tree, struct LOOP* loop) {
+    if (!has_value_range(tree->type) || range_of_type(tree->type).min >= 0) return false;
+    return range_of_tree(tree, loop).max < 0;
 }
 
 bool tree_is_positive(const NODE* tree, struct LOOP* loop) {
     return tree_is_non_negative(tree, loop) && tree_is_non_zero(tree, loop);
 }
 
-bool tree_is_zero(const NODE* tree, struct LOOP*) {
-    return is_integer(tree->type) && known_bits(tree).zeros == type_mask(tree->type).value;
-}
+bool tree_is_zero(const NODE* tree, struct LOOP* loop) { return tree_is_ivalue(tree, 0, loop); }
 
-bool tree_is_non_zero(const NODE* tree, struct LOOP*) { return is_integer(tree->type) && known_bits(tree).ones != 0; }
+bool tree_is_non_zero(const NODE* tree, struct LOOP* loop) { return is_non_zero(tree, loop, MOST_LEVELS); }
 
 int sign_of_integer_expression(const NODE* tree, struct LOOP* loop, bool non_negative_counts) {
     if (non_negative_counts ? tree_is_non_negative(tree, loop) : tree_is_positive(tree, loop)) return 1;
     return tree_is_negative(tree, loop) ? -1 : 0;
 }
 
-INT65 max_ICON_factor(const NODE* tree, struct LOOP*, bool) {
-    if (!is_integer(tree->type)) return 1;
-    const uint64_t zeros = known_bits(tree).zeros, mask = type_mask(tree->type).value;
-    int n = 0;
-    while (n < static_cast<int>(tree->type->size) - 1 && (zeros & mask) >> n & 1) ++n;
-    return INT65(1) << INT65(n);
-}
-
-bool expr_product_may_overflow(const NODE*, struct LOOP*) { return true; }
+// ---- Values
 
 bool tree_is_ivalue(const NODE* tree, INT65 value, struct LOOP* loop) {
-    INT65 min, max;
-    return calculate_bounds(tree, loop, &min, &max) && min == value && max == value;
+    if (!has_value_range(tree->type)) return false;
+    if (range_of_tree(tree, loop).is(to_wide(value))) return true;
+    const LINEAR form(tree, loop);
+    return form.is_constant() && range_of_type(tree->type).holds(to_wide(value)) && form.constant_is(value);
 }
 
 bool tree_is_not_ivalue(const NODE* tree, INT65 value, struct LOOP* loop) {
-    INT65 min, max;
-    return calculate_bounds(tree, loop, &min, &max) && (value < min || max < value);
+    if (!has_value_range(tree->type)) return false;
+    if (!range_of_tree(tree, loop).holds(to_wide(value))) return true;
+    if (value.is_zero()) return tree_is_non_zero(tree, loop);
+    const KNOWN_BITS k = known_bits(tree);
+    const uint64_t bits = value.value & type_mask(tree->type).value;
+    return (bits & k.zeros) || (~bits & k.ones);
 }
 
-bool constant_divides_expr(INT65 value, TYPE* type, const NODE* tree, struct LOOP* loop) {
-    return is_integer(tree->type) && type->size >= tree->type->size && (max_ICON_factor(tree, loop) % value).is_zero();
+bool tree_difference_is_ivalue(const NODE* a, const NODE* b, INT65 value, struct LOOP* loop) {
+    if (value.is_zero() && a->type->size == b->type->size && is_same_value(a, b)) return true;
+    if (!LINEAR::takes(a) || !LINEAR::takes(b) || a->type->size != b->type->size) return false;
+    LINEAR difference(a, loop);
+    difference.subtract(b);
+    return difference.is_constant() && difference.constant_is(value);
 }
 
-bool integer_DIV_is_exact(const NODE* tree, struct LOOP* loop) {
-    return tree->op == DIV && is_integer(tree->type) && tree->right->op == ICON && !tree->right->u.lval.is_zero() &&
-           constant_divides_expr(tree->right->u.lval, tree->type, tree->left, loop);
+bool tree_values_are_not_equal(const NODE* a, const NODE* b, struct LOOP* loop) {
+    if (has_value_range(a->type) && has_value_range(b->type)) {
+        const RANGE x = range_of_tree(a, loop), y = range_of_tree(b, loop);
+        if (x.max < y.min || y.max < x.min) return true;
+        const bool one_form = a->type->size == b->type->size && wraps_signed(a->type) == wraps_signed(b->type);
+        const KNOWN_BITS p = known_bits(a), q = known_bits(b);
+        if (one_form && ((p.ones & q.zeros) || (p.zeros & q.ones))) return true;
+    }
+    if (!LINEAR::takes(a) || !LINEAR::takes(b) || a->type->size != b->type->size) return false;
+    LINEAR difference(a, loop);
+    difference.subtract(b);
+    return difference.cannot_be_zero(loop);
+}
+
+// ---- Overflow
+
+bool expr_product_may_overflow(const NODE* tree, struct LOOP* loop) {
+    const NODE* t = without_wrappers(tree);
+    if (t->op != MULT || !has_value_range(t->type) || t->type->is_enum() || product_levels > MOST_PRODUCT_LEVELS)
+        return true;
+    if (!has_value_range(t->left->type) || !has_value_range(t->right->type)) return true;
+    if (t->right->op == ICON && t->right->u.lval.is_zero()) return false;
+    ++product_levels;
+    const RANGE a = range_of_tree(t->left, loop), b = range_of_tree(t->right, loop);
+    --product_levels;
+    for (WIDE x : {a.min, a.max})
+        for (WIDE y : {b.min, b.max})
+            if (prod_may_overflow(to_int65(x), to_int65(y), t->type)) return true;
+    return false;
+}
+
+// ---- Seams
+
+void install_symbolic_seams() {
+    type_ops_seams.calculate_bounds = calculate_bounds;
+    type_ops_seams.constant_divides_expr = [](INT65 constant, const NODE* tree) {
+        return constant_divides_expr(constant, tree->type, tree, nullptr);
+    };
+    bif_seams.calculate_bounds = calculate_bounds;
+}
+
+// ---- Helpers
+
+uint32_t clp2(uint32_t v) {
+    if (v > 0x80000000u) return 0;
+    uint32_t p = v ? 1 : 0;
+    while (p < v) p <<= 1;
+    return p;
+}
+
+uint32_t uint_gcd(uint32_t a, uint32_t b) { return std::gcd(a, b); }
+
+uint32_t uint_lcm(uint32_t a, uint32_t b) {
+    if (!a || !b) return 0;
+    const uint64_t m = uint64_t(a) / std::gcd(a, b) * b;
+    return m > 0xFFFFFFFFu ? 0 : static_cast<uint32_t>(m);
+}
+
+int compare_SLLONG_values(INT65 a, INT65 b, TYPE* type) {
+    a = truncate_to_type(a, type);
+    b = truncate_to_type(b, type);
+    return a < b ? -1 : b < a ? 1 : 0;
 }

@@ -1,7 +1,7 @@
 // Questions about the value of an integer tree that hold whatever its variables hold: bounds, signs, factors, overflow.
 //
-// Trees are borrowed and never changed, but by the last group. Values are the target's: arithmetic wraps at the width of
-// the operator's type, so that nothing is concluded from the absence of overflow unless a function says so.
+// Trees are borrowed and never changed, but by the last group. Values are the target's: arithmetic wraps at the width
+// of the operator's type, so that nothing is concluded from the absence of overflow unless a function says so.
 //
 // "Don't know" is the safe answer: false of a predicate, the limits of the type of a bound, 1 of a factor. Every answer
 // holds for each evaluation of the tree that has no undefined operation (a division by zero, an overlong shift). Of a
@@ -34,22 +34,23 @@ bool tree_is_non_zero(const NODE* tree, struct LOOP* loop);
 // 1 positive, or not negative where `non_negative_counts`; -1 negative; 0 not known.
 int sign_of_integer_expression(const NODE* tree, struct LOOP* loop, bool non_negative_counts);
 
-// ---- Values. Of two trees: both evaluated at one point of the program; a difference is that of the true values.
+// ---- Values. Of two trees: both evaluated at one point of the program. A difference is taken as the target takes it,
+// wrapping at the width of the trees, which must be the same; pointers have one too.
 bool tree_is_ivalue(const NODE* tree, INT65 value, struct LOOP* loop);
 bool tree_is_not_ivalue(const NODE* tree, INT65 value, struct LOOP* loop);
 bool tree_difference_is_ivalue(const NODE* a, const NODE* b, INT65 value, struct LOOP* loop);
 bool tree_values_are_not_equal(const NODE* a, const NODE* b, struct LOOP* loop);
 
 // ---- Factors
-// The largest constant that is known to divide the value: at least 1. A value that is zero for certain gives the highest
-// power of two in its type. With `no_signed_overflow` signed sums and products are taken to be exact, as the language
-// promises; without, an odd factor only stays where the bounds show that nothing wraps.
+// The largest constant that is known to divide the value: at least 1. A value that is zero for certain gives the
+// highest power of two in its type. With `no_signed_overflow` signed sums and products are taken to be exact, as the
+// language promises; without, an odd factor only stays where the bounds show that nothing wraps.
 INT65 max_ICON_factor(const NODE* tree, struct LOOP* loop, bool no_signed_overflow = false);
-// The greatest common divisor of the constant coefficients of the tree's terms, from its shape alone: at least 1; 0 where
-// every term is zero. What it divides is the tree as a formula: the value itself only if no operation wraps.
+// The greatest common divisor of the constant coefficients of the tree's terms, from its shape alone: at least 1; 0
+// where every term is zero. What it divides is the tree as a formula: the value itself only if no operation wraps.
 INT65 max_ICON_coef(const NODE* tree);
-// Consumes the tree. Each coefficient is divided by `value`, which must divide `max_ICON_coef`: the result times `value`
-// is the tree, in arithmetic that wraps.
+// Consumes the tree and simplifies what changes. Each coefficient is divided by `value`, which must divide
+// `max_ICON_coef`: the result times `value` is the tree, in arithmetic that wraps.
 NODE* div_ICON_coef(NODE* tree, INT65 value);
 // Whether `value` (not 0) divides the tree's value as converted to `type`.
 bool constant_divides_expr(INT65 value, TYPE* type, const NODE* tree, struct LOOP* loop);
@@ -57,7 +58,7 @@ bool constant_divides_expr(INT65 value, TYPE* type, const NODE* tree, struct LOO
 INT65 max_ICON_delta(const NODE* tree, struct LOOP* loop);
 // The largest factor that facts about this very tree assert: at least 1.
 INT65 max_asserted_ICON_factor(const NODE* tree, struct LOOP* loop);
-bool integer_DIV_is_exact(const NODE* tree, struct LOOP* loop); // DIV without a remainder
+bool integer_DIV_is_exact(const NODE* tree, struct LOOP* loop);                // DIV without a remainder
 bool expr_cannot_divide_expr(const NODE* a, const NODE* b, struct LOOP* loop); // no multiple of a is b
 // The tree's value as converted to `type`, modulo `value` (above 0): from 0 to value - 1; -1 where that isn't known.
 INT65 expr_modulo_constant(const NODE* tree, TYPE* type, INT65 value, struct LOOP* loop);
@@ -68,8 +69,8 @@ bool positive_tree_is_power_of_2(const NODE* tree, struct LOOP* loop);
 bool expr_product_may_overflow(const NODE* tree, struct LOOP* loop); // also true of what is no MULT of integers
 
 // ---- Partial evaluation
-// A new tree without the parts that vary in `loop`, whose value is never below (above) the tree's in any iteration. Parts
-// are replaced by their bounds. Where `must_be_bounded`, null if a part has no better bound than its type's.
+// A new tree without the parts that vary in `loop`, whose value is never below (above) the tree's in any iteration.
+// Parts are replaced by their bounds. Where `must_be_bounded`, null if a part has no better bound than its type's.
 NODE* partially_eval_for_maximum(const NODE* tree, struct LOOP* loop, bool must_be_bounded);
 NODE* partially_eval_for_minimum(const NODE* tree, struct LOOP* loop, bool must_be_bounded);
 // Consumes the tree, whose value is known to be one of low, low + step, ... up to high; the result has that value
@@ -79,13 +80,15 @@ NODE* simp_tree_in_range(NODE* tree, INT65 low, INT65 high, INT65 step);
 // ---- Helpers
 uint32_t clp2(uint32_t v); // the least power of two that is not below v; 0 where that has no 32 bits, and of 0
 uint32_t uint_gcd(uint32_t a, uint32_t b);
-uint32_t uint_lcm(uint32_t a, uint32_t b);                 // 0 if one is 0, or where it has no 32 bits
+uint32_t uint_lcm(uint32_t a, uint32_t b);               // 0 if one is 0, or where it has no 32 bits
 int compare_SLLONG_values(INT65 a, INT65 b, TYPE* type); // -1, 0, 1: both as `type` holds them
+
+void install_symbolic_seams(); // once: other rooms' questions are answered here
 
 // What the questions ask of a loop, installed by the room that keeps loops; with null, a loop tells nothing.
 struct LOOP_SEAMS {
     const std::vector<NODE*>& (*givens)(const struct LOOP* loop) = nullptr; // conditions that hold throughout the loop
-    struct LOOP* (*parent)(const struct LOOP* loop) = nullptr;             // null of the outermost
+    struct LOOP* (*parent)(const struct LOOP* loop) = nullptr;              // null of the outermost
     bool (*is_constant_in)(const NODE* tree, const struct LOOP* loop) = nullptr; // one value in all iterations
 };
 extern LOOP_SEAMS loop_seams;

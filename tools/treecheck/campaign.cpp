@@ -50,10 +50,23 @@ private:
         for (const OPERATION& op : operations)
             if (!found && whole.check(op))
                 found = judge(tree, seed, [&](const NODE* t) { return TRIAL(t, seed, c.assignments).check(op); });
-        if (!found && whole.check_facts())
-            found = judge(tree, seed, [&](const NODE* t) { return TRIAL(t, seed, c.assignments).check_facts(); });
+        if (!found) found = ask(&make, tree, seed);
         if (!found && c.strict) judge(tree, seed, check_canonical);
         erase_tree(tree);
+    }
+
+    // What is known of the tree: by itself, and among givens.
+    bool ask(GENERATOR* make, const NODE* tree, uint64_t seed) {
+        const bool with_givens = !tree_has_side_effects(tree) && make->random.one_in(2);
+        SURROUNDINGS around;
+        for (unsigned n = with_givens ? make->random.pick(4) : 0; n; --n)
+            around.givens.push_back(simp_tree(insert_mandatory_casts(make->given()), nullptr));
+        for (unsigned n = with_givens ? 1 + make->random.pick(2) : 0; n; --n) around.varying.insert(make->favourite());
+        const SURROUNDINGS* s = with_givens ? &around : nullptr;
+        const int assignments = s ? 2 * c.assignments : c.assignments;
+        if (judge(tree, seed, [&](const NODE* t) { return TRIAL(t, seed, assignments, s).check_facts(); })) return true;
+        return s &&
+               judge(tree, seed, [&](const NODE* t) { return TRIAL(t, seed, assignments, s).check(operations[0]); });
     }
 
     // Runs the check; a finding is reported for the smallest tree that has one of the same kind.

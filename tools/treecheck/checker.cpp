@@ -3,6 +3,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
 
 #include <cstring>
 #include <set>
@@ -29,17 +30,31 @@ bool opposite_as_int(BITS expected, const FORM& before, BITS value, const FORM& 
 
 } // namespace
 
-const OPERATION mandatory_casts = {"casts", is_no_assignment, insert_mandatory_casts, nullptr, true};
+namespace {
+
+NODE* put_casts_in(NODE* t, struct LOOP*) { return insert_mandatory_casts(t); }
+NODE* simplify(NODE* t, struct LOOP* loop) { return simp_tree(t, loop); }
+NODE* simplify_twice(NODE* t, struct LOOP* loop) { return simp_tree(simp_tree(t, loop), loop); }
+NODE* for_control(NODE* t, struct LOOP* loop) { return simp_for_control(simp_tree(t, loop), loop); }
+NODE* as_boolean(NODE* t, struct LOOP* loop) { return make_boolean(simp_tree(t, loop), loop); }
+NODE* inverted(NODE* t, struct LOOP* loop) { return invert_boolean_tree(simp_tree(t, loop)); }
+NODE* peeled(NODE* t, struct LOOP*) { return peel_for_effect(t); }
+NODE* simplified_and_peeled(NODE* t, struct LOOP* loop) { return peel_for_effect(simp_tree(t, loop)); }
+NODE* folded(NODE* t, struct LOOP*) { return fold_constants(t); }
+
+} // namespace
+
+const OPERATION mandatory_casts = {"casts", is_no_assignment, put_casts_in, nullptr, true};
 
 const std::vector<OPERATION> operations = {
-    {"simp", nullptr, [](NODE* t) { return simp_tree(t, nullptr); }, nullptr, true},
-    {"twice", nullptr, [](NODE* t) { return simp_tree(simp_tree(t, nullptr), nullptr); }, nullptr, true},
-    {"control", is_scalar, [](NODE* t) { return simp_for_control(simp_tree(t, nullptr), nullptr); }, same_truth, true},
-    {"boolean", is_scalar, [](NODE* t) { return make_boolean(simp_tree(t, nullptr), nullptr); }, truth_as_int, true},
-    {"invert", is_scalar, [](NODE* t) { return invert_boolean_tree(simp_tree(t, nullptr)); }, opposite_as_int, true},
-    {"peel", nullptr, peel_for_effect, nullptr, false},
-    {"simp and peel", nullptr, [](NODE* t) { return peel_for_effect(simp_tree(t, nullptr)); }, nullptr, false},
-    {"fold", nullptr, fold_constants, nullptr, true},
+    {"simp", nullptr, simplify, nullptr, true},
+    {"twice", nullptr, simplify_twice, nullptr, true},
+    {"control", is_scalar, for_control, same_truth, true},
+    {"boolean", is_scalar, as_boolean, truth_as_int, true},
+    {"invert", is_scalar, inverted, opposite_as_int, true},
+    {"peel", nullptr, peeled, nullptr, false},
+    {"peel after simp", nullptr, simplified_and_peeled, nullptr, false},
+    {"fold", nullptr, folded, nullptr, true},
 };
 
 // ---- Contents of variables
@@ -167,35 +182,77 @@ std::string TRIAL::contents(int assignment) const {
     return s;
 }
 
-TRIAL::TRIAL(const NODE* t, uint64_t case_seed, int assignments) : tree(t), seed(case_seed), form(form_of(t->type)) {
-    for_each_node(const_cast<NODE*>(tree), [this](const NODE* n) {
+// ---- Surroundings
+SURROUNDINGS::~SURROUNDINGS() {
+    for (NODE* fact : givens) erase_tree(fact);
+}
+
+std::string SURROUNDINGS::text() const {
+    std::string s;
+    for (const NODE* fact : givens) s += "; given " + tree_to_infix(fact);
+    return s;
+}
+
+namespace {
+const SURROUNDINGS& behind(const struct LOOP* loop) { return *reinterpret_cast<const SURROUNDINGS*>(loop); }
+} // namespace
+
+struct LOOP* SURROUNDINGS::loop() const {
+    loop_seams.givens = [](const struct LOOP* loop) -> const std::vector<NODE*>& { return behind(loop).givens; };
+    loop_seams.is_constant_in = [](const NODE* t, const struct LOOP* loop) {
+        bool varies = false;
+        for_each_node(const_cast<NODE*>(t), [&](const NODE* n) {
+            varies = varies || side_effects[n->op] ||
+                     (n->op == NAME ? behind(loop).varying.count(n->u.sym) != 0
+                                    : n->op == UMULT || n->op == STDOT || n->op == STREF);
+        });
+        return !varies;
+    };
+    return reinterpret_cast<struct LOOP*>(const_cast<SURROUNDINGS*>(this));
+}
+
+TRIAL::TRIAL(const NODE* t, uint64_t case_seed, int assignments, const SURROUNDINGS* surroundings)
+    : tree(t), seed(case_seed), around(surroundings), form(form_of(t->type)) {
+    auto collect = [this](const NODE* n) {
         if (n->op == ICON) constants.push_back(n->u.lval.value);
         if (n->op == NAME && n->type->is_int() && !n->type->is_volatile()) variables.push_back(n->u.sym);
-    });
+    };
+    for_each_node(const_cast<NODE*>(tree), collect);
+    if (around)
+        for (NODE* fact : around->givens) for_each_node(fact, collect);
     EVALUATOR e;
     runs.reserve(static_cast<size_t>(assignments));
     for (int n = 0; n < assignments; ++n) {
+        if (around && !givens_hold(&e, n)) continue;
         begin(&e, n);
         const BITS v = e.eval(tree);
-        if (e.undefined) continue;
-        ++defined;
-        runs.push_back({n, v, e.overflowed, e.events, e.memory});
+        if (!e.undefined) runs.push_back({n, v, e.overflowed, e.events, e.memory});
     }
+}
+
+bool TRIAL::givens_hold(EVALUATOR* e, int assignment) const {
+    for (const NODE* fact : around->givens) {
+        begin(e, assignment);
+        if (!e->truth(fact) || e->undefined) return false;
+    }
+    return true;
 }
 
 FINDING TRIAL::check(const OPERATION& op) const {
     FINDING finding;
     if (runs.empty() || (op.takes && !op.takes(tree))) return finding;
-    NODE* result = op.apply(copy_tree(tree));
+    NODE* result = op.apply(copy_tree(tree), around ? around->loop() : nullptr);
     auto report = [&](const std::string& what, int assignment) {
         finding.what = std::string(op.name) + ": " + what;
         finding.before = tree_text(tree);
         finding.after = tree_text(result);
         if (assignment >= 0) finding.contents = contents(assignment);
+        if (around) finding.contents += around->text();
     };
     const FORM after = result ? form_of(result->type) : form;
     if (op.value_counts && !op.agrees && !(after == form)) report("the result has another type", -1);
     EVALUATOR e;
+    e.null_is_passed = true;
     for (const RUN& r : runs) {
         if (finding) break;
         begin(&e, r.assignment);

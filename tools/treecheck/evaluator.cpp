@@ -168,6 +168,8 @@ BITS EVALUATOR::write(const PLACE& p, BITS v) {
     const unsigned units = p.width ? (p.bit + p.width + 15) / 16 : static_cast<unsigned>(p.form.bits + 15) / 16;
     if (!reaches(p, units) || undefined) return v;
     BITS bits = v;
+    if (p.form.is_float && std::isnan(as_double(v))) // the sign and the digits of a NaN are nobody's promise
+        v = bits = from_double(std::copysign(std::nan(""), -1.0));
     if (p.form.is_float && p.form.bits == 32) {
         const float f = static_cast<float>(as_double(v));
         uint32_t w;
@@ -271,6 +273,7 @@ BITS EVALUATOR::integer(int op, BITS a, BITS b, const FORM& f) {
     case MOD:
         if (!b) return fail();
         if (!by_sign) return op == DIV ? a / b : a % b;
+        overflowed |= sb == -1 && wrap(-a, f) == a && a;
         if (sb == -1) return op == DIV ? -a : 0;
         return static_cast<BITS>(op == DIV ? sa / sb : sa % sb);
     case EXPT: return power(a, b, f);
@@ -284,14 +287,17 @@ BITS EVALUATOR::arithmetic(int op, BITS a, const FORM& fa, BITS b, const FORM& f
         a = wrap(a, f);
         if (static_cast<int64_t>(b) < 0 || b >= static_cast<BITS>(f.bits)) return fail();
         const BITS v = op == SLL ? a << b : f.is_signed ? static_cast<BITS>(static_cast<int64_t>(a) >> b) : a >> b;
-        return convert(wrap(v, f), f, to);
+        const BITS held = wrap(v, f);
+        const auto back = op == SLL ? static_cast<BITS>(static_cast<int64_t>(held) >> b) : a;
+        overflowed |= f.is_signed && back != a;
+        return convert(held, f, to);
     }
     const FORM f = usual(fa, fb);
     a = convert(a, fa, f);
     b = convert(b, fb, f);
     if (undefined) return 0;
     const BITS base = fa.is_pointer ? a : fb.is_pointer ? b : 0;
-    if (base && wrap(integer(op, a, b, f), f) == 0 && !(fa.is_pointer && fb.is_pointer))
+    if (base && !null_is_passed && wrap(integer(op, a, b, f), f) == 0 && !(fa.is_pointer && fb.is_pointer))
         return fail(); // no place in an object has the address null
     if (f.is_float) return convert(rounded(operate(op, as_double(a), as_double(b)), f), f, to);
     return convert(wrap(integer(op, a, b, f), f), f, to);
@@ -317,10 +323,13 @@ BITS EVALUATOR::unary(const NODE* t) {
     } else {
         const bool is_negative = f.is_signed && static_cast<int64_t>(v) < 0;
         switch (t->op) {
-        case UMINUS: r = -v; break;
+        case UMINUS:
+            r = -v;
+            overflowed |= is_negative && wrap(r, f) == v;
+            break;
         case NOTB: r = ~v; break;
         case ABS: r = is_negative ? -v : v; break;
-        case SQR: r = v * v; break;
+        case SQR: r = integer(MULT, v, v, f); break;
         default: return fail();
         }
         r = wrap(r, f);

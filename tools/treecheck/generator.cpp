@@ -391,6 +391,30 @@ NODE* GENERATOR::loose(int depth) {
     return binary(op, a, b, operator_type_for_operand_types(op, a->type, b->type, nullptr, nullptr));
 }
 
+NODE* GENERATOR::given() {
+    const bool had_effects = options.effects;
+    options.effects = false;
+    SYMTAB* s = favourite();
+    while (s->type->is_float() || s->type->is_volatile()) s = random.of(w.integers);
+    TYPE* type = promoted_type(s->type);
+    NODE* x = cast_to(type, mk_NAME(s));
+    if (random.one_in(4)) x = binary(PLUS, x, constant(type), type);
+    NODE* fact;
+    if (random.one_in(3)) {
+        x = binary(MOD, x, mk_ICON(INT65(2 + random.pick(8)), type), type);
+        fact = binary(EQ, x, mk_ICON(INT65(random.pick(3) ? 0 : random.pick(2)), type), tp->int_t);
+    } else {
+        int op = NEQ + static_cast<int>(random.pick(5));
+        if (op >= LE && type->is_unsigned()) op += ULE - LE;
+        fact = binary(op, x, random.one_in(6) ? value(type, 1) : constant(type), tp->int_t);
+        if (random.one_in(8)) fact = unary(EXCLAIM, fact, tp->int_t);
+    }
+    options.effects = had_effects;
+    if (!tree_has_side_effects(fact)) return fact;
+    erase_tree(fact);
+    return mk_ICON(INT65(1), tp->int_t);
+}
+
 NODE* GENERATOR::tree() {
     TYPE* type = options.pointers && random.one_in(16) ? tp->mk_ptr(tp->int_t) : arithmetic_type();
     const int depth = 2 + static_cast<int>(random.pick(static_cast<unsigned>(options.depth) - 1));

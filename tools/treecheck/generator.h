@@ -50,6 +50,8 @@ public:
     NODE* tree();                       // of a random type
     NODE* value(TYPE* type, int depth); // of exactly this type
     NODE* constant(TYPE* type);
+    NODE* given(); // a condition on a favourite variable or on a tree of such, without effects
+    SYMTAB* favourite() { return random.of(favourites); }
     INT65 number(TYPE* type); // within the type, most often near a boundary or a power of two
     RANDOM random;
 

@@ -67,7 +67,7 @@ std::vector<NODE*> candidates(const NODE* t) {
         for (int v : {0, 1}) out.push_back(mk_ICON(INT65(v), type));
     } else {
         const INT65 v = t->u.lval;
-        for (INT65 smaller : {INT65(0), INT65(1), INT65(2), v / INT65(2), v - INT65(1), v + INT65(1)})
+        for (INT65 smaller : {INT65(0), INT65(1), INT65(2), v / INT65(2), v / INT65(8)})
             out.push_back(mk_ICON(smaller, type));
     }
     return out;

@@ -104,25 +104,29 @@ TEST(RandomTrees, FaultsAreFound) {
                           nullptr, tp->int_t),
                  tp->int_t);
     const OPERATION faults[] = {
-        {"value", nullptr, [](NODE* t) { return maketree(PLUS, t, mk_ICON(INT65(1), tp->int_t), tp->int_t); }, nullptr,
+        {"value", nullptr,
+         [](NODE* t, struct LOOP*) { return maketree(PLUS, t, mk_ICON(INT65(1), tp->int_t), tp->int_t); }, nullptr,
          true},
-        {"type", nullptr, [](NODE* t) { return maketree(SCONV, t, nullptr, tp->uint_t); }, nullptr, true},
+        {"type", nullptr, [](NODE* t, struct LOOP*) { return maketree(SCONV, t, nullptr, tp->uint_t); }, nullptr, true},
         {"effect lost", nullptr,
-         [](NODE* t) {
+         [](NODE* t, struct LOOP*) {
              erase_tree(t);
              return mk_ICON(INT65(0), tp->int_t);
          },
          nullptr, false},
-        {"effect twice", nullptr, [](NODE* t) { return mk_COMMAOP(copy_tree(t), t); }, nullptr, false},
+        {"effect twice", nullptr, [](NODE* t, struct LOOP*) { return mk_COMMAOP(copy_tree(t), t); }, nullptr, false},
         {"a store", nullptr,
-         [](NODE* t) { return mk_COMMAOP(mk_ASG(mk_NAME(world().integers[2]), mk_ICON(INT65(77), tp->uint_t)), t); },
+         [](NODE* t, struct LOOP*) {
+             return mk_COMMAOP(mk_ASG(mk_NAME(world().integers[2]), mk_ICON(INT65(77), tp->uint_t)), t);
+         },
          nullptr, true},
-        {"undefined", nullptr, [](NODE* t) { return maketree(DIV, t, mk_ICON(INT65(0), tp->int_t), tp->int_t); },
-         nullptr, true},
+        {"undefined", nullptr,
+         [](NODE* t, struct LOOP*) { return maketree(DIV, t, mk_ICON(INT65(0), tp->int_t), tp->int_t); }, nullptr,
+         true},
     };
     const TRIAL whole(sum, 5, 12);
     for (const OPERATION& op : faults) EXPECT_TRUE(whole.check(op)) << op.name;
-    EXPECT_FALSE(whole.check({"same", nullptr, [](NODE* t) { return t; }, nullptr, true}));
+    EXPECT_FALSE(whole.check({"same", nullptr, [](NODE* t, struct LOOP*) { return t; }, nullptr, true}));
     erase_tree(sum);
 }
 

@@ -1,0 +1,53 @@
+// Bounds of integer trees, as the questions about values compute them. For this room.
+#pragma once
+
+#include "OPT5/ir/node.h"
+
+#include <algorithm>
+
+struct LOOP;
+
+// Wide enough that sums and products of two bounds of 64 bits are exact or tell that they are not.
+using WIDE = __int128;
+
+struct RANGE {
+    WIDE min, max; // min <= max
+    bool is(WIDE v) const { return min == v && max == v; }
+    bool holds(WIDE v) const { return min <= v && v <= max; }
+    bool is_within(const RANGE& o) const { return o.min <= min && max <= o.max; }
+    bool operator==(const RANGE& o) const { return min == o.min && max == o.max; }
+};
+inline RANGE hull(const RANGE& a, const RANGE& b) { return {std::min(a.min, b.min), std::max(a.max, b.max)}; }
+// Both hold; `a` where they contradict each other.
+inline RANGE both(const RANGE& a, const RANGE& b) {
+    const RANGE r{std::max(a.min, b.min), std::min(a.max, b.max)};
+    return r.min <= r.max ? r : a;
+}
+
+WIDE to_wide(INT65 v);
+INT65 to_int65(WIDE v); // of a value in its range
+
+bool has_value_range(const TYPE* t); // an integer or enumeration of 1 to 64 bits
+bool wraps_signed(const TYPE* t);    // of such a type
+// The values that a variable of the type can have. An enumeration may hold values of either sign.
+RANGE range_of_type(const TYPE* t);
+// What is left of exact results from `min` to `max` once they are wrapped into the type.
+RANGE wrapped(WIDE min, WIDE max, const TYPE* t);
+RANGE range_of_tree(const NODE* tree, struct LOOP* loop); // of a tree whose type has a range
+// Whether an operation over exact operands (PLUS, MINUS, MULT, UMINUS, SLL by a constant) stays within its type.
+bool operation_is_exact(const NODE* tree, struct LOOP* loop);
+
+// Calls `visit(condition, holds)` for conditions known in the loop and those around it, or in the function; of a
+// conjunction for its parts. `holds` tells whether the condition or its opposite is known.
+template <class VISIT>
+void for_each_given(struct LOOP* loop, VISIT&& visit);
+
+// Whether `a` is `b`, and both have one value wherever they stand.
+bool is_same_value(const NODE* a, const NODE* b);
+
+// Neither writes nor reads what is volatile, and has few enough nodes to have been looked at.
+bool is_small_and_pure(const NODE* t);
+
+const NODE* without_wrappers(const NODE* t); // SSA operators and marks that stand for their operand
+
+#include "OPT5/simp/givens.h"

@@ -51,6 +51,9 @@ public:
             if (root->left->op != ENDLOOP) root->left = value(root->left);
             return;
         case RETURN: root->right = value(root->right); return;
+        case ANDAND:
+        case OROR:
+        case QUEST: root->left = value(root->left); return; // the rest runs under a condition
         default: break;
         }
         if (is_assignment(root->op)) {

@@ -1,0 +1,199 @@
+// Constant and copy propagation on functions made by hand: what C programs do not reach.
+
+#include "../ir/function_fixture.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/scalar/fcp.h"
+#include "OPT5/simp/simp.h"
+
+#include <string>
+
+namespace {
+
+class FcpTest : public FunctionTest {
+protected:
+    static void SetUpTestSuite() {
+        FunctionTest::SetUpTestSuite();
+        init_simplifier();
+    }
+    void TearDown() override {
+        reset_alias_info();
+        file_symbols_are_known = false;
+        global_symbols = nullptr;
+        FunctionTest::TearDown();
+    }
+    void set(SYMTAB* to, NODE* value) { add(maketree(ASG, mk_NAME(to), value, to->type)); }
+    static NODE* icon(long v) { return mk_ICON(INT65(v), tp->int_t); }
+    static NODE* address(SYMTAB* s) { return maketree(UAND, mk_NAME(s), nullptr, tp->mk_ptr(s->type)); }
+    // A value that may be another one each time.
+    NODE* fresh() {
+        SYMTAB* f = make_symbol("_f", function_type(), SC_EXTERN, 0);
+        return maketree(UCALL, maketree(UAND, mk_NAME(f), nullptr, tp->mk_ptr(f->type)), nullptr, tp->int_t);
+    }
+    static std::string text() {
+        std::string all;
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (LIST* s = bb->statements; s; s = s->rest) all += stmt2infix(s->first) + "; ";
+        return all;
+    }
+    static bool says(const std::string& part) { return text().find(part) != std::string::npos; }
+};
+
+TEST_F(FcpTest, CleanUpCodeKeepsItsVariables) {
+    SYMTAB *x = local("x"), *y = local("y"), *sum = local("s");
+    set(x, icon(1));
+    set(y, icon(2));
+    set(sum, maketree(PLUS, mk_NAME(x), mk_NAME(y), tp->int_t));
+    ret(sum);
+    currfuninfo->eht.resize(2);
+    currfuninfo->eht[1].cleanup = maketree(PLUS, mk_NAME(x), icon(1), tp->int_t);
+    build();
+    fast_CP(4, 0);
+    EXPECT_TRUE(says("x = 1")) << text();
+    EXPECT_FALSE(says("y")) << text();
+    EXPECT_TRUE(valid());
+}
+
+TEST_F(FcpTest, TheExtentOfAnArrayKeepsItsVariable) {
+    SYMTAB *n = local("n"), *a = local("a", tp->mk_array(tp->int_t, false, 1, true));
+    a->size_tree = mk_NAME(n);
+    set(n, icon(7));
+    ret(n);
+    build();
+    fast_CP(4, 0);
+    EXPECT_TRUE(says("n = 7")) << text();
+    erase_tree(a->size_tree);
+    a->size_tree = nullptr;
+}
+
+TEST_F(FcpTest, ChainsAreFollowedFromRoundToRound) {
+    SYMTAB *x = local("x"), *y = local("y"), *z = local("z"), *w = local("w");
+    set(z, fresh());
+    set(y, mk_NAME(z));
+    set(x, mk_NAME(y));
+    set(w, maketree(MULT, mk_NAME(x), mk_NAME(y), tp->int_t));
+    ret(w);
+    build();
+    fast_CP(4, 0);
+    EXPECT_TRUE(says("w = z * z")) << text();
+    EXPECT_FALSE(says("x") || says("y")) << text();
+}
+
+TEST_F(FcpTest, CopiesOfWhatChangesStay) {
+    SYMTAB *x = local("x"), *y = local("y"), *c = local("c");
+    set(c, fresh());
+    define(1);
+    set(x, fresh()); // once in the text, but in a loop
+    branch_if(c, 2, 3);
+    define(2);
+    set(y, mk_NAME(x));
+    define(3);
+    set(c, maketree(PLUS, mk_NAME(y), mk_NAME(x), tp->int_t));
+    branch_if(c, 1, 4);
+    define(4);
+    ret(y);
+    build();
+    fast_CP(4, 0);
+    EXPECT_TRUE(says("y = x")) << text();
+    EXPECT_TRUE(says("c = y + x")) << text();
+}
+
+TEST_F(FcpTest, AnEntryThatALoopReturnsToRunsMoreThanOnce) {
+    SYMTAB *x = local("x"), *y = local("y"), *c = local("c");
+    define(1);
+    set(x, fresh());
+    branch_if(c, 2, 3);
+    define(2);
+    set(y, mk_NAME(x));
+    define(3);
+    set(c, maketree(MINUS, mk_NAME(y), mk_NAME(x), tp->int_t));
+    branch_if(c, 1, 4);
+    define(4);
+    ret(y);
+    build();
+    fast_CP(4, 0);
+    EXPECT_TRUE(says("y = x")) << text();
+}
+
+TEST_F(FcpTest, WhatRestrictSaysStaysWithItsVariable) {
+    TYPE *pointer = tp->mk_ptr(tp->int_t), *sole = tp->mk_qual(pointer, QUAL_RESTRICT);
+    SYMTAB *from = local("from", pointer), *own = local("own", sole), *fixed = local("fixed", sole), *x = local("x");
+    SYMTAB* a = local("a", tp->mk_array(tp->int_t, false, 4, true));
+    set(from, maketree(PCONV, fresh(), nullptr, pointer));
+    set(own, mk_NAME(from));
+    set(fixed, maketree(UAND, mk_NAME(a), nullptr, pointer));
+    set(x, maketree(UMULT, mk_NAME(own), nullptr, tp->int_t));
+    set(x, maketree(UMULT, mk_NAME(fixed), nullptr, tp->int_t));
+    ret(x);
+    build();
+    fast_CP(4, 0);
+    EXPECT_TRUE(says("x = *own")) << text();
+    EXPECT_FALSE(says("fixed")) << text();
+}
+
+TEST_F(FcpTest, PropagableValues) {
+    SYMTAB *x = local("x"), *s = local("s", tp->mk_array(tp->int_t, false, 4, true));
+    NODE* string = new_node(SCON, tp->mk_ptr(tp->schar_t));
+    string->mk_scon("ab", 3);
+    auto cast = [](int op, NODE* t, TYPE* type) { return maketree(op, t, nullptr, type); };
+    TYPE* pointer = tp->mk_ptr(tp->int_t);
+    struct {
+        NODE* tree;
+        int uses;
+        bool expected;
+    } cases[] = {
+        {icon(3), 9, true},
+        {string, 1, true},
+        {copy_tree(string), 2, false},
+        {address(s), 2, true},
+        {maketree(PLUS, address(s), icon(2), pointer), 2, true},
+        {maketree(PLUS, address(s), mk_NAME(x), pointer), 2, false},
+        {maketree(UAND, maketree(UMULT, mk_NAME(x), nullptr, tp->int_t), nullptr, pointer), 2, false},
+        {cast(SCONV, icon(1), tp->long_t), 2, true},
+        {cast(SCONV, mk_NAME(x), tp->long_t), 2, false},
+        {cast(PCONV, icon(0), pointer), 2, true},
+        {cast(PCONV, icon(0x7000), pointer), 2, false},
+        {cast(PCONV, address(s), pointer), 2, true},
+        {mk_NAME(x), 2, false},
+        {maketree(PLUS, icon(1), icon(2), tp->int_t), 2, false},
+    };
+    for (const auto& c : cases) {
+        EXPECT_EQ(expr_is_propagable(c.tree, c.uses), c.expected) << tree_to_infix(c.tree);
+        erase_tree(c.tree);
+    }
+}
+
+TEST_F(FcpTest, GlobalsThatNeverChange) {
+    struct {
+        const char* name;
+        unsigned quals;
+        int sclass;
+        unsigned cqual;
+        bool analyzed, replaced;
+    } cases[] = {
+        {"_constant", QUAL_CONST, SC_STATIC, CQ_REFERENCED | CQ_ALIASED | CQ_WRITTEN, false, true},
+        {"_elsewhere", QUAL_CONST, SC_EXTERN, CQ_REFERENCED, true, false},
+        {"_port", QUAL_CONST | QUAL_VOLATILE, SC_STATIC, CQ_REFERENCED, true, false},
+        {"_unwritten", 0, SC_STATIC, CQ_REFERENCED, true, true},
+        {"_unwritten", 0, SC_STATIC, CQ_REFERENCED, false, false},
+        {"_written", 0, SC_STATIC, CQ_REFERENCED | CQ_WRITTEN, true, false},
+        {"_aliased", 0, SC_STATIC, CQ_REFERENCED | CQ_ALIASED, true, false},
+    };
+    for (const auto& c : cases) {
+        TYPE* type = c.quals ? tp->mk_qual(tp->int_t, c.quals) : tp->int_t;
+        SYMTAB* g = make_symbol(c.name, type, c.sclass, 0);
+        g->cqual = static_cast<uint16_t>(c.cqual);
+        g->init_value = icon(42);
+        file_symbols_are_known = c.analyzed;
+        NODE* t = propagate_global_constants(maketree(PLUS, mk_NAME(g), icon(1), tp->int_t));
+        EXPECT_EQ(t->left->op == ICON, c.replaced) << c.name << " " << c.analyzed;
+        erase_tree(t);
+        t = propagate_global_constants(mk_ASG(mk_NAME(g), address(g)));
+        EXPECT_EQ(t->left->op, NAME) << "what is written is no value";
+        EXPECT_EQ(t->right->left->op, NAME) << "nor is what has its address taken";
+        erase_tree(t);
+        delete g;
+    }
+}
+
+} // namespace

@@ -1,21 +1,66 @@
-// Rules for integer operators, one function a family. Each owns the node, whose operands are simplified, and returns
-// what stands for it.
+// The handlers of the dispatch on the opcode, one a family. Each owns the node, whose operands are simplified, and
+// returns what stands for it. `loop` may be null.
 #pragma once
 
 #include "OPT5/ir/node.h"
 
 struct LOOP;
 
-// What the known bits decide: a constant, or the tree. Asked for operators that combine bits.
-NODE* simp_by_known_bits(NODE* t);
-NODE* simp_PLUS(NODE* t);
-NODE* simp_MINUS(NODE* t);
-NODE* simp_MULT(NODE* t);
-NODE* simp_DIV(NODE* t);
-NODE* simp_MOD(NODE* t);
-NODE* simp_shift(NODE* t);
-NODE* simp_bitop(NODE* t);                   // ANDB, ORB, XORB
-NODE* simp_unary(NODE* t);                   // UMINUS, NOTB
-NODE* simp_relop(NODE* t);                   // integer and pointer compares
-NODE* simp_arms(NODE* t, struct LOOP* loop); // QUEST
-NODE* simp_cast_of_cast(NODE* t);            // SCONV
+// ---- Arithmetic and bits
+NODE* simp_by_known_bits(NODE* t); // a constant where every bit of the value is known, or the tree
+NODE* simp_PLUS(NODE* t, struct LOOP* loop);
+NODE* simp_MINUS(NODE* t, struct LOOP* loop);
+NODE* simp_MULT(NODE* t, struct LOOP* loop);
+NODE* simp_DIV(NODE* t, struct LOOP* loop);
+NODE* simp_MOD(NODE* t, struct LOOP* loop);
+NODE* simp_shift(NODE* t, struct LOOP* loop); // SLL, SRL
+NODE* simp_bitop(NODE* t, struct LOOP* loop); // ANDB, ORB, XORB
+NODE* simp_unary(NODE* t, struct LOOP* loop); // UMINUS, NOTB
+NODE* simp_ABS(NODE* t, struct LOOP* loop);
+NODE* simp_SQR(NODE* t, struct LOOP* loop);
+
+// ---- Floating point
+NODE* simp_float_sum(NODE* t, struct LOOP* loop); // PLUS, MINUS
+NODE* simp_float_relop(NODE* t, struct LOOP* loop);
+NODE* simp_float_MULT(NODE* t, struct LOOP* loop);
+NODE* simp_float_DIV(NODE* t, struct LOOP* loop);
+NODE* simp_float_unary(NODE* t); // UMINUS
+NODE* simp_RECIP(NODE* t, struct LOOP* loop);
+
+// ---- Truth values
+NODE* simp_relop(NODE* t, struct LOOP* loop);
+NODE* simp_QUEST(NODE* t, struct LOOP* loop);
+NODE* simp_EXCLAIM(NODE* t, struct LOOP* loop);
+NODE* simp_OROR(NODE* t, struct LOOP* loop);     // and ANDAND
+NODE* join_compares(NODE* t, struct LOOP* loop); // of two compares under ANDB or ORB one, or null
+
+// ---- Casts
+NODE* simp_SCONV(NODE* t, struct LOOP* loop);
+NODE* simp_PCONV(NODE* t, struct LOOP* loop); // and ISP2CHAR
+
+// ---- Places and addresses
+NODE* simp_UMULT(NODE* t, struct LOOP* loop);
+NODE* simp_STREF(NODE* t, struct LOOP* loop);
+NODE* simp_STDOT(NODE* t, struct LOOP* loop);
+NODE* simp_UAND(NODE* t, struct LOOP* loop);
+NODE* simp_ARGREF(NODE* t, struct LOOP* loop);
+NODE* simp_ACONV(NODE* t, struct LOOP* loop);
+NODE* simp_PMCONV(NODE* t, struct LOOP* loop); // and PVCONV
+
+// ---- Assignments and calls
+NODE* simp_ASG(NODE* t, struct LOOP* loop);
+NODE* simp_opASG(NODE* t, struct LOOP* loop);
+NODE* simp_STASG(NODE* t, struct LOOP* loop);
+NODE* simp_MEMCPY(NODE* t, struct LOOP* loop);
+NODE* simp_call(NODE* t, struct LOOP* loop);
+NODE* simp_ICALL(NODE* t, struct LOOP* loop); // the descriptor's own simplifier
+NODE* simp_COMMAOP(NODE* t, struct LOOP* loop);
+void install_BIF_simplifiers(); // once, after the descriptors are made
+
+// ---- Vectors and complex values
+NODE* simp_vector_node(NODE* t);
+NODE* simp_vector_pack(NODE* t);
+NODE* simp_vector_VFIELD(NODE* t);
+NODE* simp_vector_VRCONV(NODE* t);
+NODE* simp_vector_VSCONV(NODE* t);
+NODE* simp_complexop(NODE* t, struct LOOP* loop);

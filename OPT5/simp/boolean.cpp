@@ -1,19 +1,25 @@
 // Trees as truth values.
+//
+// A condition is in control form: it is zero where it does not hold and anything else where it does; compares with
+// zero, widening casts and shifts of a single bit that say nothing more are gone.
 
-#include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
+
+using namespace rules;
 
 namespace {
 
-NODE* drop_node(NODE* t) {
-    NODE* operand = t->left;
-    t->left = nullptr;
-    erase_tree(t);
-    return operand;
-}
+constexpr int SHORT_MASK = 16; // bits that a mask may reach to be as cheap as a shift
+
+bool TYPE_IS_SCALAR(const TYPE* t) { return t->is_scalar(); }
 
 NODE* zero_of(TYPE* type) {
-    if (!type->is_float()) return mk_ICON(INT65(0), type->is_pointer() ? tp->long_t : type->stqs());
+    if (!type->is_float()) return mk_ICON(INT65(0), type->stqs());
     NODE* t = new_node(FCON, type->stqs());
     t->u.fval = new simul_fval(pos_zero);
     return t;
@@ -21,27 +27,31 @@ NODE* zero_of(TYPE* type) {
 
 // `int_op` or its floating form against zero, with the casts that the types need.
 NODE* compare_with_zero(NODE* t, int int_op, int float_op, struct LOOP* loop) {
-    int op = t->type->is_float() ? float_op : int_op;
-    NODE* test = maketree(op, t, zero_of(t->type), tp->int_t, t->ls);
-    return simp_node(insert_mandatory_casts(test), loop);
+    LS* ls = t->ls;
+    if (t->type->is_float()) return simp_node(maketree(float_op, t, zero_of(t->type), tp->int_t, ls), loop);
+    NODE* zero = zero_of(t->type->is_pointer() ? tp->long_t : promoted_type(t->type));
+    t = coerced(t->type->is_pointer() ? t->type->stqs() : promoted_type(t->type), t, loop);
+    return simp_node(maketree(int_op, t, coerce_to_type(t->type->stqs(), zero), tp->int_t, ls), loop);
 }
 
-bool is_integer(const NODE* t) { return t->type->is_int() || t->type->is_enum(); }
-bool is_icon(const NODE* t, INT65 v) { return t->op == ICON && t->u.lval == v; }
+bool is_integral(const NODE* t) { return t->type->is_int() || t->type->is_enum(); }
+bool is_scalar_number(const NODE* t) { return t->type->is_scalar() && !t->type->is_float() && !t->type->is_complex(); }
 
-// `t != 0` says what t says. So does a cast that only widens, and a cast between pointers.
-NODE* without_tests_and_casts(NODE* t) {
+// `t != 0` says what t says. So does a cast that only widens, a cast between pointers, and what only moves or changes
+// the sign of a value.
+NODE* without_idle_layers(NODE* t) {
     for (;;) {
-        bool is_test = t->op == NEQ && is_icon(t->right, INT65(0)) && t->left->type->is_scalar() &&
-                       !t->left->type->is_float() && !t->left->type->is_complex();
-        bool widens = t->op == SCONV && is_integer(t) && is_integer(t->left) && t->left->type->size <= t->type->size;
-        bool is_pointer_cast =
-            (t->op == PCONV || t->op == ISP2CHAR) && (t->left->type->is_pointer() || t->left->op == ICON);
-        // A bit-field is read through a cast.
-        if (widens && (t->left->op == STDOT || t->left->op == STREF)) return t;
-        if (!is_test && !widens && !is_pointer_cast) return t;
-        if (is_pointer_cast && t->left->op == ICON && t->left->type->size > t->type->size) return t;
-        t = drop_node(t);
+        const bool is_test = t->op == NEQ && is_icon(t->right, INT65(0)) && is_scalar_number(t->left);
+        const bool widens = t->op == SCONV && is_integral(t) && is_integral(t->left) &&
+                            (t->left->type->size <= t->type->size || t->type->is_bool()) &&
+                            !is_bitfield_access(t->left);
+        const bool is_pointer_cast = (t->op == PCONV || t->op == ISP2CHAR) &&
+                                     (t->left->type->is_pointer() || t->left->op == ICON) &&
+                                     t->left->type->size <= t->type->size;
+        const bool keeps_zero = (t->op == UMINUS || t->op == ABS) && is_integer(t->type) && operand_has_type(t);
+        if (!is_test && !widens && !is_pointer_cast && !keeps_zero) return t;
+        if (t->right) erase_tree(t->right);
+        t = take_left(t);
     }
 }
 
@@ -50,35 +60,108 @@ NODE* constant_truth(NODE* t, bool value) {
     return mk_COMMAOP(effects, mk_ICON(INT65(value ? 1 : 0), tp->int_t));
 }
 
+bool all_bits_are_zero(const NODE* t) { return is_integral(t) && find_known_zeros(t, t->type) == type_mask(t->type); }
+
+// ---- Rules of the control form
+NODE* known_truth(NODE* t, struct LOOP* loop) {
+    if (t->op == ICON) {
+        NODE* truth = mk_ICON(INT65(t->u.lval.is_zero() ? 0 : 1), tp->int_t);
+        truth->ls = t->ls;
+        erase_tree(t);
+        return truth;
+    }
+    if (t->type->is_pointer()) return pointer_contains_adcon_term(t) ? constant_truth(t, true) : nullptr;
+    if (!is_integral(t)) return nullptr;
+    if (all_bits_are_zero(t)) return constant_truth(t, false);
+    if (!find_known_ones(t, t->type).is_zero() || tree_is_non_zero(t, loop)) return constant_truth(t, true);
+    return nullptr;
+}
+
 // x % 2^k is zero where the low k bits are, whatever the sign.
-NODE* mask_for_MOD(NODE* t) {
-    if (t->op != MOD || t->right->op != ICON || !is_integer(t) || power_of_2(t->right->u.lval) < 0) return t;
+NODE* mask_for_MOD(NODE* t, struct LOOP* loop) {
+    if (!is_node_with_icon(t, MOD) || log2_of(t->right) < 0) return nullptr;
     t->op = ANDB;
-    t->right->u.lval = truncate_to_type(t->right->u.lval - INT65(1), t->right->type);
+    set_icon(t->right, t->right->u.lval - INT65(1));
+    return simp_for_control(simp_node(t, loop), loop);
+}
+
+NODE* test_of_bit(NODE* shift, int n, struct LOOP* loop) {
+    TYPE* type = shift->type->stqs();
+    NODE* x = shift->left;
+    erase_node(shift->right);
+    erase_node(shift);
+    return made(ANDB, x, mk_ICON(INT65(1) << INT65(n), type), type, loop);
+}
+
+// (x >> n) & 1, also with a narrowing cast between, and x >> (width - 1), look at one bit.
+NODE* mask_for_shift(NODE* t, struct LOOP* loop) {
+    if (t->op == SRL) {
+        const int n = shift_count_of(t);
+        return n && n == static_cast<int>(t->type->size) - 1 ? test_of_bit(t, n, loop) : nullptr;
+    }
+    if (!is_node(t, ANDB) || !is_icon(t->right, INT65(1))) return nullptr;
+    NODE* shift = t->left;
+    if (shift->op == SCONV && is_integer(shift->left->type)) shift = shift->left;
+    const int n = shift->op == SRL ? shift_count_of(shift) : 0;
+    if (!n || (n >= SHORT_MASK && promoted_type(shift->type)->size > SHORT_MASK)) return nullptr;
+    if (shift != t->left) erase_node(t->left);
+    erase_node(t->right);
+    erase_node(t);
+    return test_of_bit(shift, n, loop);
+}
+
+// (x ^ m) & p with the single bit p inside m: (x & p) ^ p.
+NODE* flip_tested_bit(NODE* t, struct LOOP* loop) {
+    if (!is_node_with_icon(t, ANDB) || !is_node_with_icon(t->left, XORB)) return nullptr;
+    const uint64_t p = bits_of(t->right), m = bits_of(t->left->right);
+    if (power_of_2(INT65(0, p)) < 0 || !(m & p)) return nullptr;
+    NODE* flip = t->left;
+    set_icon(flip->right, t->right->u.lval);
+    t->left = flip->left;
+    flip->left = simp_node(t, loop);
+    return simp_node(flip, loop);
+}
+
+// x - y and x ^ y are zero where x and y are equal.
+NODE* compare_for_difference(NODE* t, struct LOOP* loop) {
+    if (!is_node(t, MINUS) && !is_node(t, XORB)) return nullptr;
+    if (is_node_with_icon(t, XORB) && is_node_with_icon(t->left, ANDB) && bits_of(t->left->right) == bits_of(t->right))
+        return nullptr; // a tested bit that is flipped
+    t->op = NEQ;
+    t->type = tp->int_t;
+    return simp_for_control(simp_node(t, loop), loop);
+}
+
+// c ? 1 : 0 and c ? 0 : 1 of any constants that differ in truth
+NODE* truth_of_arms(NODE* t, struct LOOP* loop) {
+    if (t->op != QUEST || t->right->op != COLON) return nullptr;
+    NODE *a = t->right->left, *b = t->right->right;
+    if (!is_icon(a) || !is_icon(b) || a->u.lval.is_zero() == b->u.lval.is_zero()) return nullptr;
+    const bool straight = !a->u.lval.is_zero();
+    erase_tree(t->right);
+    NODE* condition = simp_for_control(take_left(t), loop);
+    return straight ? condition : simp_node(invert_boolean_tree(condition), loop);
+}
+
+// What is done before the condition has no part in it.
+NODE* truth_behind_effects(NODE* t, struct LOOP* loop) {
+    if (t->op != COMMAOP) return nullptr;
+    t->right = simp_for_control(t->right, loop);
+    t->type = t->right->type;
     return t;
 }
 
-// (x >> n) & 1, and x >> (width - 1), look at one bit.
-NODE* mask_for_shift(NODE* t) {
-    bool tests_low_bit = t->op == ANDB && is_icon(t->right, INT65(1)) && t->left->op == SRL;
-    NODE* shift = tests_low_bit ? t->left : t;
-    if (shift->op != SRL || !is_integer(shift) || shift->right->op != ICON) return t;
-    INT65 n = shift->right->u.lval, width(shift->left->type->size);
-    bool in_range = !n.is_negative() && n < width && equiv_mtypes(shift->left->type, shift->type) &&
-                    (!tests_low_bit || equiv_mtypes(shift->type, t->type));
-    if (!in_range || (!tests_low_bit && n != width - INT65(1))) return t;
-    TYPE* type = shift->type->stqs();
-    NODE* bit = maketree(ANDB, shift->left, mk_ICON(INT65(1) << n, type), type, t->ls);
-    shift->left = nullptr;
-    erase_tree(t);
-    return bit;
+// x * c is zero where x is, for an odd c or where nothing wraps.
+NODE* truth_of_factor(NODE* t, struct LOOP* loop) {
+    if (!is_node_with_icon(t, MULT) || t->right->u.lval.is_zero()) return nullptr;
+    if ((t->right->u.lval & INT65(1)).is_zero() && expr_product_may_overflow(t, loop)) return nullptr;
+    erase_node(t->right);
+    return simp_for_control(take_left(t), loop);
 }
 
-bool all_bits_are_zero(const NODE* t) {
-    if (!type_ops_seams.find_known_zeros || !is_integer(t)) return false;
-    INT65 mask = type_mask(t->type);
-    return (mask & ~type_ops_seams.find_known_zeros(t, t->type)).is_zero();
-}
+const RULE control_rules[] = {known_truth,          mask_for_MOD,           mask_for_shift,
+                              flip_tested_bit,      compare_for_difference, truth_of_arms,
+                              truth_behind_effects, truth_of_factor};
 
 } // namespace
 
@@ -98,23 +181,31 @@ NODE* make_boolean(NODE* t, struct LOOP* loop) {
 
 NODE* invert_boolean_tree(NODE* t) {
     bool is_test = t->op == EQ && is_icon(t->right, INT65(0)) && !t->left->type->is_pointer();
-    if (is_test && returns_1_or_0(t->left)) return coerce_to_type(tp->int_t, drop_node(t));
+    if (is_test && returns_1_or_0(t->left)) {
+        erase_node(t->right);
+        return coerce_to_type(tp->int_t, take_left(t));
+    }
     if (tree_is_trivially_invertible(t)) {
         t->op = boolean_inv[t->op];
         return t;
     }
-    OPT_ASSERT(t->type->is_scalar());
+    const TYPE* etype = t->type;
+    OPT_ASSERT(TYPE_IS_SCALAR(etype));
     return compare_with_zero(t, EQ, FEQ, nullptr);
 }
 
 NODE* simp_for_control(NODE* t, struct LOOP* loop) {
-    t = without_tests_and_casts(t);
-    if (t->op == ICON) {
-        NODE* truth = mk_ICON(INT65(t->u.lval.is_zero() ? 0 : 1), tp->int_t);
-        erase_tree(t);
-        return truth;
-    }
-    if (t->type->is_pointer() && pointer_contains_adcon_term(t)) return constant_truth(t, true);
-    if (all_bits_are_zero(t)) return constant_truth(t, false);
-    return simp_node(mask_for_shift(mask_for_MOD(t)), loop);
+    t = without_idle_layers(t);
+    for (RULE rule : control_rules)
+        if (NODE* r = rule(t, loop)) return r;
+    // A chain was simplified as it was built; to go down it again from each of its nodes would be quadratic.
+    const bool is_chain = t->op == OROR || t->op == ANDAND || t->op == QUEST || t->op == COMMAOP;
+    return is_chain ? t : simp_node(t, loop);
+}
+
+NODE* simp_EXCLAIM(NODE* t, struct LOOP* loop) {
+    if (!t->left->type->is_scalar() || t->left->type->is_complex()) return t;
+    TYPE* type = t->type;
+    NODE* inverse = invert_boolean_tree(simp_for_control(take_left(t), loop));
+    return coerce_to_type(type, simp_node(inverse, loop));
 }

@@ -9,7 +9,8 @@
 
 struct LOOP;
 
-// Once, after `init_types`: tells the type rules on trees what the simplifier knows of values.
+// Once, after `init_types` and `init_BIF_descriptors`: tells the type rules on trees what the simplifier knows of
+// values, and the descriptors how calls of built-in functions simplify.
 void init_simplifier();
 
 void simp_all_trees();                          // every statement of the current function
@@ -22,9 +23,19 @@ NODE* invert_boolean_tree(NODE* tree);             // the logical opposite
 // What remains of a tree whose value isn't used, or null.
 NODE* peel_for_effect(NODE* tree);
 
-// Puts an ICON of `value` and `type` in place of every subtree that is congruent to `target`, effects of which stay in front
-// of it, and simplifies the operators above. What an assignment writes or an address is taken of is left alone. `target` is
-// borrowed and must not be part of `tree`.
+// The operands of a chain of one associative integer operator, equal ones and constants joined. A chain with nothing to
+// join comes back as it is; so does one with side effects, or of more than a bounded number of nodes.
+NODE* simp_assoc(NODE* tree, struct LOOP* loop);
+NODE* simp_ss_tree(NODE* tree, struct LOOP* loop); // a subscript or an address; null stays null
+// A tree with the same bits as `tree` where `mask` has ones, and no bits computed that do not count for them.
+NODE* prop_mask_into_subtree(NODE* tree, INT65 mask);
+// Of a chain of integer sums, or of one commutative operator, without effects: the term that is congruent to `term`
+// stands first, and all others in the right operand. `term` is borrowed. Another tree, or one without the term, stays.
+NODE* bubble_term_to_top(NODE* tree, const NODE* term);
+
+// Puts an ICON of `value` and `type` in place of every subtree that is congruent to `target`, effects of which stay in
+// front of it, and simplifies the operators above. What an assignment writes or an address is taken of is left alone.
+// `target` is borrowed and must not be part of `tree`.
 NODE* simp_subst_icon(INT65 value, TYPE* type, const NODE* target, NODE* tree);
 
 // ---- Constants

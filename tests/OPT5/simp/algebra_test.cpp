@@ -1,4 +1,4 @@
-// Rules of integer algebra: exact by an evaluator of its own, and the rewrites that must happen.
+// Rules of integer algebra: exact by an evaluator of its own, and effects that must stay.
 
 #include "../ir/evaluator.h"
 
@@ -144,97 +144,6 @@ TEST_F(Algebra, RangesGiveTheirCommonBits) {
         }
     EXPECT_EQ(find_known_zeros_in_range(INT65(0), INT65(7)), ~INT65(7));
     EXPECT_EQ(find_known_ones_in_range(INT65(8), INT65(11)), INT65(8));
-}
-
-// The canonical forms. x, y are int, u is unsigned, l is long.
-TEST_F(Algebra, Rewrites) {
-    SYMTAB *xs = symbol("x", tp->int_t), *ys = symbol("y", tp->int_t), *us = symbol("u", tp->uint_t),
-           *ls = symbol("l", tp->long_t);
-    auto x = [&] { return name(xs); };
-    auto y = [&] { return name(ys); };
-    auto u = [&] { return name(us); };
-    auto l = [&] { return name(ls); };
-    auto c = [](long v) { return icon(v); };
-    auto uc = [](long v) { return icon(v, tp->uint_t); };
-    auto f = [] { return call("f", tp->int_t); };
-    struct ROW {
-        NODE* tree;
-        const char* expected;
-    } rows[] = {
-        // sums
-        {bin(PLUS, x(), c(0)), "x"},
-        {bin(PLUS, c(3), x()), "x + 3"},
-        {bin(PLUS, bin(PLUS, x(), c(3)), c(4)), "x + 7"},
-        {bin(PLUS, c(4), bin(PLUS, c(3), x())), "x + 7"},
-        {bin(PLUS, bin(PLUS, x(), c(3)), c(-3)), "x"},
-        {bin(PLUS, bin(PLUS, x(), c(32767)), c(1)), "x + -32768"},
-        {bin(PLUS, x(), un(UMINUS, y())), "x - y"},
-        {bin(PLUS, un(UMINUS, x()), y()), "y - x"},
-        {bin(MINUS, x(), c(0)), "x"},
-        {bin(MINUS, x(), x()), "0"},
-        {bin(MINUS, c(0), x()), "-x"},
-        {bin(MINUS, x(), un(UMINUS, y())), "x + y"},
-        {bin(MINUS, bin(PLUS, x(), c(5)), c(5)), "x"},
-        {un(UMINUS, un(UMINUS, x())), "x"},
-        {un(NOTB, un(NOTB, x())), "x"},
-        // products and quotients
-        {bin(MULT, x(), c(1)), "x"},
-        {bin(MULT, x(), c(0)), "0"},
-        {bin(MULT, f(), c(0)), "f(), 0"},
-        {bin(MULT, x(), c(-1)), "-x"},
-        {bin(MULT, bin(MULT, x(), c(3)), c(5)), "x * 15"},
-        {bin(MULT, un(UMINUS, x()), c(3)), "x * -3"},
-        {bin(DIV, x(), c(1)), "x"},
-        {bin(DIV, x(), c(-1)), "-x"},
-        {bin(DIV, u(), uc(8)), "u >> 3"},
-        {bin(DIV, x(), c(8)), "x / 8"}, // rounds toward zero
-        {bin(MOD, u(), uc(8)), "u & 7u"},
-        {bin(MOD, x(), c(8)), "x % 8"},
-        {bin(MOD, bin(ANDB, x(), c(255)), c(8)), "x & 7"},
-        {bin(MOD, x(), c(1)), "0"},
-        {bin(MOD, f(), c(1)), "f(), 0"},
-        // shifts
-        {bin(SLL, x(), c(0)), "x"},
-        {bin(SLL, bin(SLL, x(), c(2)), c(3)), "x << 5"},
-        {bin(SRL, bin(SRL, x(), c(9)), c(9)), "x >> 15"},
-        {bin(SRL, bin(SRL, u(), c(9)), c(9)), "0u"},
-        {bin(SLL, bin(SLL, u(), c(9)), c(9)), "0u"},
-        // bits
-        {bin(ANDB, x(), c(0)), "0"},
-        {bin(ANDB, x(), c(-1)), "x"},
-        {bin(ANDB, x(), x()), "x"},
-        {bin(ANDB, bin(ANDB, x(), c(12)), c(6)), "x & 4"},
-        {bin(ANDB, bin(SRL, u(), c(12)), uc(15)), "u >> 12"},
-        {bin(ANDB, bin(SLL, x(), c(4)), c(15)), "0"},
-        {bin(ORB, x(), c(0)), "x"},
-        {bin(ORB, x(), c(-1)), "-1"},
-        {bin(ORB, bin(ORB, x(), c(1)), c(2)), "x | 3"},
-        {bin(ORB, bin(ORB, x(), c(3)), c(2)), "x | 3"},
-        {bin(XORB, x(), c(0)), "x"},
-        {bin(XORB, x(), x()), "0"},
-        {bin(XORB, x(), c(-1)), "~x"},
-        {bin(XORB, bin(XORB, x(), c(5)), c(5)), "x"},
-        // compares
-        {bin(LT, c(3), x()), "x > 3"},
-        {bin(EQ, x(), x()), "1"},
-        {bin(LT, x(), x()), "0"},
-        {bin(ULT, u(), uc(0)), "0"},
-        {bin(UGE, u(), uc(0)), "1"},
-        {bin(EQ, bin(ANDB, x(), c(4)), c(3)), "0"},
-        {bin(LT, bin(ANDB, x(), c(15)), c(16)), "1"},
-        {bin(EQ, bin(PLUS, x(), c(3)), c(5)), "x == 2"},
-        {bin(NEQ, bin(XORB, x(), c(3)), c(1)), "x != 2"},
-        // casts
-        {un(SCONV, un(SCONV, x(), tp->long_t), tp->int_t), "x"},
-        {un(SCONV, un(SCONV, l(), tp->ulong_t), tp->int_t), "(int)l"},
-        {un(SCONV, un(SCONV, u(), tp->long_t), tp->ulong_t), "(unsigned long)u"},
-    };
-    for (ROW& row : rows) {
-        const std::string before = show(row.tree);
-        row.tree = simp_tree(row.tree, nullptr);
-        EXPECT_EQ(tree_to_infix(row.tree), row.expected) << before;
-        erase_tree(row.tree);
-    }
 }
 
 // What has an effect, or could change in between, is not joined or dropped.

@@ -1,0 +1,334 @@
+// Operators on bits: and, or, exclusive or, complement.
+//
+// Canonical forms: a constant outermost and on the right; complements outermost; a common operand or shift of both
+// sides taken out; casts that only widen outside. What the bits decide is decided.
+
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/rule.h"
+#include "OPT5/simp/simp.h"
+
+using namespace rules;
+
+namespace {
+
+bool is_bit_op(int op) { return op == ANDB || op == ORB || op == XORB; }
+
+INT65 combined(int op, INT65 a, INT65 b) { return op == ANDB ? a & b : op == ORB ? a | b : a ^ b; }
+
+// ---- Constants
+NODE* join_constants(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_node_with_icon(inner, t->op)) return nullptr;
+    if (is_icon(t->right)) {
+        set_icon(t->right, combined(t->op, inner->right->u.lval, t->right->u.lval));
+        erase_node(inner->right);
+        t->left = take_left(inner);
+        return simp_node(t, loop);
+    }
+    std::swap(t->right, inner->right); // (x op c) op y: the constant goes outward
+    t->left = simp_node(inner, loop);
+    return simp_node(t, loop);
+}
+
+NODE* constant_of_right_operand_outward(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->right;
+    if (is_icon(t->left) || !is_node_with_icon(inner, t->op)) return nullptr;
+    NODE* c = inner->right;
+    t->right = take_left(inner);
+    TYPE* type = t->type;
+    const int op = t->op;
+    return made(op, simp_node(t, loop), c, type, loop);
+}
+
+NODE* trivial_constant(NODE* t, struct LOOP* loop) {
+    if (!is_icon(t->right)) return nullptr;
+    const bool zero = is_icon(t->right, INT65(0)), ones = is_all_ones(t->right);
+    if (t->op == ANDB && zero) return constant_for(t, INT65(0));
+    if (t->op == ORB && ones) return constant_for(t, INT65(-1));
+    if (t->op == ANDB ? ones : zero) return only_left(t);
+    if (t->op != XORB || !ones) return nullptr;
+    erase_node(t->right);
+    return simp_node(to_unary(t, NOTB, t->left), loop);
+}
+
+// Bits that the constant decides do not count below it; bits that are known need no constant.
+NODE* constant_against_known_bits(NODE* t, struct LOOP*) {
+    if (!is_icon(t->right) || t->op == XORB) return nullptr;
+    const uint64_t mask = mask_of(t->type), c = bits_of(t->right);
+    const KNOWN_BITS k = known_bits(t->left);
+    if (t->op == ANDB ? ((k.zeros | c) & mask) == mask : (c & ~k.ones) == 0) return only_left(t);
+    t->left = prop_mask_into_subtree(t->left, INT65(0, t->op == ANDB ? c : mask & ~c));
+    return nullptr;
+}
+
+// (x & c1) | c2 with no bit left for the mask to clear.
+NODE* mask_under_or(NODE* t, struct LOOP* loop) {
+    if (t->op != ORB || !is_icon(t->right) || !is_node_with_icon(t->left, ANDB)) return nullptr;
+    if ((bits_of(t->left->right) | bits_of(t->right)) != mask_of(t->type)) return nullptr;
+    t->left = only_left(t->left);
+    return simp_node(t, loop);
+}
+
+// ---- Operands that meet
+bool is_complement_of(const NODE* a, const NODE* b) { return is_unary(a, NOTB) && same_value(a->left, b); }
+
+NODE* meet_itself(NODE* t, struct LOOP*) {
+    if (same_value(t->left, t->right)) return t->op == XORB ? constant_for(t, INT65(0)) : only_left(t);
+    if (is_complement_of(t->left, t->right) || is_complement_of(t->right, t->left))
+        return constant_for(t, INT65(t->op == ANDB ? 0 : -1));
+    return nullptr;
+}
+
+NODE* copy_of_other(const NODE* node, const NODE* x) {
+    return same_value(node->left, x)    ? copy_tree(node->right)
+           : same_value(node->right, x) ? copy_tree(node->left)
+                                        : nullptr;
+}
+
+// x op (x op2 y), for `x` on either side: absorption and what is left of it.
+NODE* absorb(NODE* t, NODE* x, const NODE* inner, struct LOOP* loop) {
+    if (is_icon(x) || !is_bit_op(inner->op) || !operands_have_type(inner) || !is_pure(t)) return nullptr;
+    TYPE* type = t->type;
+    const int op = t->op;
+    const bool holds_complement = is_complement_of(inner->left, x) || is_complement_of(inner->right, x);
+    if (holds_complement && ((op == ANDB && inner->op == ORB) || (op == ORB && inner->op == ANDB))) {
+        // x & (~x | y), x | (~x & y): the complement adds nothing
+        NODE *y = copy_tree(is_complement_of(inner->left, x) ? inner->right : inner->left), *kept = copy_tree(x);
+        erase_tree(t);
+        return made(op, kept, y, type, loop);
+    }
+    NODE* y = copy_of_other(inner, x);
+    if (!y) return nullptr;
+    if ((op == ANDB && inner->op == ORB) || (op == ORB && inner->op == ANDB)) {
+        erase_tree(y);
+        return replace_by(t, copy_tree(x));
+    }
+    if (op != XORB && inner->op == op) { // x & (x & y)
+        erase_tree(y);
+        return replace_by(t, copy_tree(inner));
+    }
+    if (op == XORB && inner->op == XORB) return replace_by(t, y);
+    if (op == ORB) { // x | (x ^ y)
+        NODE* kept = copy_tree(x);
+        erase_tree(t);
+        return made(ORB, kept, y, type, loop);
+    }
+    // x ^ (x & y), x & (x ^ y): x & ~y.  x ^ (x | y): y & ~x.
+    NODE *kept = copy_tree(x), *masked = y;
+    if (inner->op == ORB) std::swap(kept, masked);
+    erase_tree(t);
+    return made(ANDB, kept, made(NOTB, masked, nullptr, type, loop), type, loop);
+}
+
+NODE* absorb_either(NODE* t, struct LOOP* loop) {
+    if (NODE* r = absorb(t, t->left, t->right, loop)) return r;
+    return absorb(t, t->right, t->left, loop);
+}
+
+// ~x & ~y is ~(x | y); ~x ^ y is ~(x ^ y); ~x ^ c is x ^ ~c.
+NODE* complements_outward(NODE* t, struct LOOP* loop) {
+    const bool left = is_unary(t->left, NOTB), right = is_unary(t->right, NOTB);
+    TYPE* type = t->type;
+    if (t->op == XORB && left && is_icon(t->right)) {
+        t->left = take_left(t->left);
+        set_icon(t->right, ~t->right->u.lval);
+        return simp_node(t, loop);
+    }
+    if (t->op == XORB ? !left && !right : !left || !right) return nullptr;
+    if (left) t->left = take_left(t->left);
+    if (right) t->right = take_left(t->right);
+    if (t->op != XORB) t->op = t->op == ANDB ? ORB : ANDB;
+    const bool complements = t->op != XORB || left != right;
+    t = simp_node(t, loop);
+    return complements ? made(NOTB, t, nullptr, type, loop) : t;
+}
+
+// (x & y) op (x & z) is x & (y op z), and for | and & exchanged; also (x & ~y) | (~x & y) is x ^ y.
+NODE* factor_out(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (l->op != r->op || (l->op != ANDB && l->op != ORB) || l->op == t->op || !operands_have_type(l) ||
+        !operands_have_type(r))
+        return nullptr;
+    if ((l->op == ORB && t->op != ANDB) || !is_pure(l) || !is_pure(r)) return nullptr;
+    if (t->op == ORB && l->op == ANDB)
+        for (int side = 0; side < 4; ++side) {
+            NODE *a = side & 1 ? l->right : l->left, *b = side & 1 ? l->left : l->right;
+            NODE *c = side & 2 ? r->right : r->left, *d = side & 2 ? r->left : r->right;
+            if (!is_complement_of(b, c) || !is_complement_of(d, a)) continue;
+            NODE *x = copy_tree(a), *y = copy_tree(c);
+            TYPE* type = t->type;
+            erase_tree(t);
+            return made(XORB, x, y, type, loop);
+        }
+    for (int side = 0; side < 4; ++side) {
+        NODE *&a = side & 1 ? l->right : l->left, *&b = side & 2 ? r->right : r->left;
+        if (is_icon(a) != is_icon(b) || !same_value(a, b)) continue;
+        NODE *common = a, *x = side & 1 ? l->left : l->right, *y = side & 2 ? r->left : r->right;
+        const int outer = l->op;
+        erase_tree(b);
+        erase_node(l);
+        erase_node(r);
+        NODE* inner = made(t->op, x, y, t->type, loop);
+        return simp_node(to_binary(t, outer, common, inner), loop);
+    }
+    return nullptr;
+}
+
+// (x | y) ^ (x & y) is x ^ y.
+NODE* or_without_and(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (t->op != XORB || !((is_node(l, ORB) && is_node(r, ANDB)) || (is_node(l, ANDB) && is_node(r, ORB))))
+        return nullptr;
+    const bool straight = same_value(l->left, r->left) && same_value(l->right, r->right);
+    const bool crossed = same_value(l->left, r->right) && same_value(l->right, r->left);
+    if (!straight && !crossed) return nullptr;
+    NODE *x = copy_tree(l->left), *y = copy_tree(l->right);
+    TYPE* type = t->type;
+    erase_tree(t);
+    return made(XORB, x, y, type, loop);
+}
+
+// (x << n) op (y << n) is (x op y) << n, and for right shifts.
+NODE* common_shift_outward(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    const int n = shift_count_of(l);
+    if (!n || l->op != r->op || shift_count_of(r) != n) return nullptr;
+    t->left = l->left;
+    t->right = take_left(r);
+    l->left = simp_node(t, loop);
+    return simp_node(l, loop);
+}
+
+// (T)x op (T)y, and (T)x & c with c in x's own bits: the operator is as well applied to what is cast.
+NODE* cast_outward(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (l->op != SCONV || !is_integer(l->left->type) || is_bitfield_access(l->left)) return nullptr;
+    TYPE *narrow = l->left->type->stqs(), *type = t->type;
+    if (narrow->size < tp->int_t->size || narrow->size >= type->size) return nullptr;
+    if (is_icon(r)) {
+        const uint64_t below = narrow->is_unsigned() ? mask_of(narrow) : mask_of(narrow) >> 1;
+        if (t->op != ANDB || (bits_of(r) & ~below) != 0) return nullptr;
+        r->type = narrow;
+        set_icon(r, r->u.lval);
+    } else if (r->op == SCONV && same_integers(r->left->type, narrow) && !is_bitfield_access(r->left)) {
+        r = take_left(r);
+    } else {
+        return nullptr;
+    }
+    l->left = made(t->op, l->left, r, narrow, loop);
+    erase_node(t);
+    return coerce_to_type(type, simp_node(l, loop));
+}
+
+// A compare under ^ 1 is the opposite compare.
+NODE* invert_compare(NODE* t, struct LOOP* loop) {
+    if (t->op != XORB || !is_icon(t->right, INT65(1)) || !tree_is_trivially_invertible(t->left) ||
+        t->left->op == EXCLAIM)
+        return nullptr;
+    TYPE* type = t->type;
+    erase_node(t->right);
+    return coerce_to_type(type, simp_node(invert_boolean_tree(take_left(t)), loop));
+}
+
+const RULE bit_rules[] = {trivial_constant,
+                          join_constants,
+                          constant_of_right_operand_outward,
+                          constant_against_known_bits,
+                          mask_under_or,
+                          meet_itself,
+                          absorb_either,
+                          complements_outward,
+                          invert_compare,
+                          factor_out,
+                          or_without_and,
+                          common_shift_outward,
+                          cast_outward,
+                          join_compares};
+
+// ---- Unary operators
+NODE* negate_sum(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (is_unary(inner, NOTB)) { // -~x
+        NODE* x = take_left(inner);
+        return simp_node(to_binary(t, PLUS, x, icon_of(INT65(1), t)), loop);
+    }
+    if (is_node(inner, MINUS) && (is_icon(inner->left) || (is_pure(inner->left) && is_pure(inner->right)))) {
+        std::swap(inner->left, inner->right);
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    if (is_node_with_icon(inner, PLUS) && (!is_signed(t->type) || inner->right->u.lval != int_type_min(t->type))) {
+        set_icon(inner->right, -inner->right->u.lval);
+        std::swap(inner->left, inner->right);
+        inner->op = MINUS;
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    return nullptr;
+}
+
+NODE* complement_sum(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (is_unary(inner, UMINUS)) { // ~-x is x - 1
+        NODE* x = take_left(inner);
+        return simp_node(to_binary(t, PLUS, x, icon_of(INT65(-1), t)), loop);
+    }
+    if (is_node_with_icon(inner, PLUS) || is_node_with_icon(inner, MINUS)) { // ~(x + c) is ~c - x
+        INT65 c = inner->op == PLUS ? inner->right->u.lval : -inner->right->u.lval;
+        set_icon(inner->right, ~c);
+        inner->op = MINUS;
+        std::swap(inner->left, inner->right);
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    if (is_node(inner, MINUS) && is_icon(inner->left)) { // ~(c - x) is x + ~c
+        set_icon(inner->left, ~inner->left->u.lval);
+        std::swap(inner->left, inner->right);
+        inner->op = PLUS;
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    if (is_node_with_icon(inner, XORB)) {
+        set_icon(inner->right, ~inner->right->u.lval);
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    // ~(~x & y) is x | ~y
+    if ((is_node(inner, ANDB) || is_node(inner, ORB)) && is_unary(inner->left, NOTB)) {
+        inner->left = take_left(inner->left);
+        inner->op = inner->op == ANDB ? ORB : ANDB;
+        inner->right = made(NOTB, inner->right, nullptr, inner->type, loop);
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    return nullptr;
+}
+
+} // namespace
+
+NODE* simp_bitop(NODE* t, struct LOOP* loop) {
+    if (!operands_have_type(t)) return t;
+    order_operands(t);
+    t = first_that_applies(bit_rules, t, loop);
+    return is_bit_op(t->op) ? simp_by_known_bits(t) : t;
+}
+
+NODE* simp_unary(NODE* t, struct LOOP* loop) {
+    if (t->type->is_float()) return simp_float_unary(t);
+    if (!operand_has_type(t)) return t;
+    TYPE* type = t->type;
+    if (is_unary(t->left, t->op)) {
+        NODE* operand = take_left(take_left(t));
+        return coerce_to_type(type, operand);
+    }
+    if (NODE* r = t->op == UMINUS ? negate_sum(t, loop) : complement_sum(t, loop)) return r;
+    return simp_by_known_bits(t);
+}
+
+NODE* simp_by_known_bits(NODE* t) {
+    if (!is_integer(t->type) || is_icon(t)) return t;
+    const KNOWN_BITS k = known_bits(t);
+    if ((k.zeros | k.ones) != mask_of(t->type)) return t;
+    return constant_for(t, truncate_to_type(INT65(0, k.ones), t->type));
+}

@@ -1,0 +1,433 @@
+// Compares of integers and pointers.
+//
+// Canonical forms: a constant on the right; what the known bits and the bounds decide is decided; what is added,
+// subtracted or cast on both sides is taken away where the order stays; a compare of a truth value with a constant is
+// that value or its opposite; an unsigned compare with 0 or 1 is an equality.
+
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/rule.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
+
+#include <algorithm>
+
+using namespace rules;
+
+namespace {
+
+bool is_equality(const NODE* t) { return t->op == EQ || t->op == NEQ; }
+bool holds_for_equals(int op) { return op == EQ || op == LE || op == GE || op == ULE || op == UGE; }
+bool is_unsigned_relop(int op) { return op >= ULE && op <= UGT; }
+int with_sign(int op, bool is_unsigned) {
+    if (op >= LE && op <= GT && is_unsigned) return op + (ULE - LE);
+    return is_unsigned_relop(op) && !is_unsigned ? op - (ULE - LE) : op;
+}
+// less, equal, greater as a bit each
+bool accepts(int op, int order) {
+    switch (with_sign(op, false)) {
+    case EQ: return order == 0;
+    case NEQ: return order != 0;
+    case LE: return order <= 0;
+    case LT: return order < 0;
+    case GE: return order >= 0;
+    default: return order > 0;
+    }
+}
+
+NODE* decided(NODE* t, bool value) { return constant_for(t, INT65(value ? 1 : 0)); }
+
+// ---- Decisions
+struct BOUNDS {
+    INT65 min, max;
+};
+
+// Least and greatest value: by the known bits and the structure, whichever is tighter.
+BOUNDS bounds_of(const NODE* t, struct LOOP* loop) {
+    const KNOWN_BITS k = known_bits(t);
+    TYPE* type = t->type;
+    uint64_t least = k.ones, most = ~k.zeros & mask_of(type);
+    if (is_signed(type) && !((k.zeros | k.ones) & sign_bit(type))) { // the sign is open: least is negative, most is not
+        least |= sign_bit(type);
+        most &= ~sign_bit(type);
+    }
+    BOUNDS b{truncate_to_type(INT65(0, least), type), truncate_to_type(INT65(0, most), type)};
+    INT65 min, max;
+    if (calculate_bounds(t, loop, &min, &max)) {
+        b.min = std::max(b.min, min);
+        b.max = std::min(b.max, max);
+    }
+    return b;
+}
+
+// 1: true, -1: false, 0: not decided.
+int outcome(int op, BOUNDS a, BOUNDS b) {
+    const bool less = a.max<b.min, greater = a.min> b.max, not_less = a.min >= b.max, not_greater = a.max <= b.min;
+    switch (with_sign(op, false)) {
+    case LT: return less ? 1 : not_less ? -1 : 0;
+    case GE: return less ? -1 : not_less ? 1 : 0;
+    case GT: return greater ? 1 : not_greater ? -1 : 0;
+    case LE: return greater ? -1 : not_greater ? 1 : 0;
+    case EQ: return less || greater ? -1 : 0;
+    default: return less || greater ? 1 : 0;
+    }
+}
+
+// A bit that is one on one side and zero on the other.
+bool bits_differ(const NODE* a, const NODE* b) {
+    const KNOWN_BITS x = known_bits(a), y = known_bits(b);
+    return (x.ones & y.zeros) || (x.zeros & y.ones);
+}
+
+NODE* decide(NODE* t, struct LOOP* loop) {
+    if (same_value(t->left, t->right)) return decided(t, holds_for_equals(t->op));
+    if (const int o = outcome(t->op, bounds_of(t->left, loop), bounds_of(t->right, loop))) return decided(t, o > 0);
+    if (is_equality(t) && bits_differ(t->left, t->right)) return decided(t, t->op == NEQ);
+    return nullptr;
+}
+
+// ---- One side a constant
+// The compare of a truth value with a constant: the value, its opposite, or decided.
+NODE* compare_truth_value(NODE* t, struct LOOP* loop) {
+    if (!is_icon(t->right) || !returns_1_or_0(t->left)) return nullptr;
+    const INT65 c = t->right->u.lval;
+    auto outcome_for = [&](int v) { return accepts(t->op, INT65(v) < c ? -1 : INT65(v) > c); };
+    const bool of_0 = outcome_for(0), of_1 = outcome_for(1);
+    if (of_0 == of_1) return decided(t, of_0);
+    TYPE* type = t->type;
+    if (of_1) {
+        NODE* value = t->left;
+        erase_node(t->right);
+        erase_node(t);
+        return coerce_to_type(type, simp_node(coerce_to_type(tp->int_t, value), loop));
+    }
+    if (tree_is_trivially_invertible(t->left)) {
+        erase_node(t->right);
+        return coerce_to_type(type, simp_node(invert_boolean_tree(take_left(t)), loop));
+    }
+    if (t->op == EQ && c.is_zero()) return nullptr;
+    t->op = EQ; // the one form of an opposite
+    set_icon(t->right, INT65(0));
+    return simp_node(t, loop);
+}
+
+// At the end of the range an order is an equality: u < 1, u >= 1, u <= 0, u > 0, x >= max.
+NODE* order_at_the_end(NODE* t, struct LOOP* loop) {
+    if (is_equality(t) || !is_icon(t->right)) return nullptr;
+    TYPE* type = t->left->type;
+    const INT65 c = t->right->u.lval, max = int_type_max(type);
+    const int op = with_sign(t->op, false);
+    int equality = 0;
+    INT65 bound = c;
+    if (type->is_unsigned()) {
+        if (c == INT65(1) && (op == LT || op == GE)) equality = op == LT ? EQ : NEQ, bound = INT65(0);
+        if (c == INT65(0) && (op == LE || op == GT)) equality = op == LE ? EQ : NEQ;
+    }
+    if (op == GE && c == max) equality = EQ;
+    if (op == GT && c == max - INT65(1)) equality = EQ, bound = max;
+    if (!equality) return nullptr;
+    t->op = equality;
+    set_icon(t->right, bound);
+    return simp_node(t, loop);
+}
+
+// x + c1 rel c2: exact for equality; for an order where neither side wraps.
+NODE* move_constant_across(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_icon(t->right) || (inner->op != PLUS && inner->op != MINUS) || !operands_have_type(inner)) return nullptr;
+    const INT65 c2 = t->right->u.lval;
+    TYPE* type = inner->type;
+    if (is_icon(inner->right)) {
+        const INT65 c1 = inner->op == PLUS ? inner->right->u.lval : -inner->right->u.lval;
+        if (!is_equality(t)) {
+            const BOUNDS x = bounds_of(inner->left, loop);
+            if (truncate_to_type(x.min + c1, type) != x.min + c1 || truncate_to_type(x.max + c1, type) != x.max + c1 ||
+                truncate_to_type(c2 - c1, type) != c2 - c1)
+                return nullptr;
+        }
+        set_icon(t->right, c2 - c1);
+        erase_node(inner->right);
+        t->left = take_left(inner);
+        return simp_node(t, loop);
+    }
+    if (!is_equality(t) || inner->op != MINUS || !is_icon(inner->left)) return nullptr;
+    set_icon(t->right, inner->left->u.lval - c2); // c1 - x == c2
+    erase_node(inner->left);
+    t->left = take_right(inner);
+    return simp_node(t, loop);
+}
+
+// x ^ c1 == c2, -x == c, ~x rel c
+NODE* undo_on_constant(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_icon(t->right)) return nullptr;
+    const INT65 c = t->right->u.lval;
+    if (is_unary(inner, NOTB)) {
+        t->op = is_equality(t) ? t->op : commute_inv[t->op];
+        set_icon(t->right, ~c);
+    } else if (is_equality(t) && is_unary(inner, UMINUS)) {
+        set_icon(t->right, -c);
+    } else if (is_equality(t) && is_node_with_icon(inner, XORB)) {
+        set_icon(t->right, c ^ inner->right->u.lval);
+        erase_node(inner->right);
+    } else {
+        return nullptr;
+    }
+    t->left = take_left(inner);
+    return simp_node(t, loop);
+}
+
+// Tests against zero, and of one bit.
+NODE* test_against_zero(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_icon(t->right, INT65(0)) || !is_equality(t)) {
+        // (x & 2^k) == 2^k is (x & 2^k) != 0
+        const bool one_bit = is_equality(t) && is_icon(t->right) && is_node_with_icon(inner, ANDB) &&
+                             bits_of(inner->right) == bits_of(t->right) && power_of_2(INT65(0, bits_of(t->right))) >= 0;
+        if (!one_bit) return nullptr;
+        t->op = t->op == EQ ? NEQ : EQ;
+        set_icon(t->right, INT65(0));
+        return simp_node(t, loop);
+    }
+    // x - y == 0, x ^ y == 0
+    if (is_node(inner, MINUS) || is_node(inner, XORB)) {
+        erase_node(t->right);
+        t->left = inner->left;
+        t->right = take_right(inner);
+        return simp_node(t, loop);
+    }
+    // x % 2^k == 0: the low bits, whatever the sign
+    if (is_node_with_icon(inner, MOD) && log2_of(inner->right) > 0) {
+        inner->op = ANDB;
+        set_icon(inner->right, inner->right->u.lval - INT65(1));
+        t->left = simp_node(inner, loop);
+        return simp_node(t, loop);
+    }
+    // (x & sign bit) != 0 of a signed x
+    if (is_node_with_icon(inner, ANDB) && is_signed(inner->type) && bits_of(inner->right) == sign_bit(inner->type)) {
+        t->op = t->op == EQ ? GE : LT;
+        erase_node(inner->right);
+        t->left = take_left(inner);
+        return simp_node(t, loop);
+    }
+    // x << n == 0, x * odd == 0
+    if (is_node_with_icon(inner, MULT) && !(inner->right->u.lval & INT65(1)).is_zero()) {
+        erase_node(inner->right);
+        t->left = take_left(inner);
+        return simp_node(t, loop);
+    }
+    return nullptr;
+}
+
+// x * c rel 0 of a product that cannot wrap is the sign of c on x.
+NODE* sign_of_product(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_icon(t->right, INT65(0)) || !is_node_with_icon(inner, MULT) || inner->right->u.lval.is_zero() ||
+        expr_product_may_overflow(inner, loop))
+        return nullptr;
+    if (inner->right->u.lval.is_negative()) t->op = commute_inv[t->op];
+    erase_node(inner->right);
+    t->left = take_left(inner);
+    return simp_node(t, loop);
+}
+
+// x / c == 0 and x >> n == 0 of an unsigned x, x >> n < 0 of a signed one.
+NODE* undo_division(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_icon(t->right, INT65(0))) return nullptr;
+    const int n = inner->op == SRL ? shift_count_of(inner) : 0;
+    if (n && is_signed(inner->type) && (t->op == LT || t->op == GE)) {
+        erase_node(inner->right);
+        t->left = take_left(inner);
+        return simp_node(t, loop);
+    }
+    if (!is_equality(t) || is_signed(inner->type)) return nullptr;
+    INT65 divisor;
+    if (n)
+        divisor = INT65(1) << INT65(n);
+    else if (is_node_with_icon(inner, DIV) && !is_icon(inner->right, INT65(0)))
+        divisor = inner->right->u.lval;
+    else
+        return nullptr;
+    t->op = t->op == EQ ? ULT : UGE;
+    set_icon(t->right, divisor);
+    erase_node(inner->right);
+    t->left = take_left(inner);
+    return simp_node(t, loop);
+}
+
+// (c ? a : b) rel d of constants: the condition decides.
+NODE* compare_arms(NODE* t, struct LOOP* loop) {
+    NODE* quest = t->left;
+    if (!is_icon(t->right) || quest->op != QUEST || quest->right->op != COLON) return nullptr;
+    NODE *a = quest->right->left, *b = quest->right->right;
+    if (!is_icon(a) || !is_icon(b) || !same_integers(a->type, quest->type) || !same_integers(b->type, quest->type))
+        return nullptr;
+    const INT65 d = t->right->u.lval;
+    auto holds = [&](const NODE* v) { return accepts(t->op, v->u.lval < d ? -1 : v->u.lval > d); };
+    const bool of_a = holds(a), of_b = holds(b);
+    if (of_a == of_b) return decided(t, of_a);
+    TYPE* type = t->type;
+    erase_node(t->right);
+    erase_tree(quest->right);
+    NODE* condition = take_left(take_left(t));
+    condition = make_boolean(condition, loop);
+    return coerce_to_type(type, of_a ? condition : simp_node(invert_boolean_tree(condition), loop));
+}
+
+// ---- Both sides
+// x + y == x, x - y == x, x ^ y == x: y is zero.  x + z == y + z: x == y.
+NODE* cancel_common_term(NODE* t, struct LOOP* loop) {
+    if (!is_equality(t) || is_icon(t->right)) return nullptr;
+    for (int side = 0; side < 2; ++side) {
+        NODE *inner = side ? t->right : t->left, *x = side ? t->left : t->right;
+        if ((inner->op != PLUS && inner->op != MINUS && inner->op != XORB) || !operands_have_type(inner) ||
+            !is_pure(inner))
+            continue;
+        NODE* rest = same_value(inner->left, x)                          ? inner->right
+                     : inner->op != MINUS && same_value(inner->right, x) ? inner->left
+                                                                         : nullptr;
+        if (!rest) continue;
+        NODE *y = copy_tree(rest), *zero = icon_of(INT65(0), rest);
+        erase_tree(t->left);
+        erase_tree(t->right);
+        t->left = y;
+        t->right = zero;
+        return simp_node(t, loop);
+    }
+    NODE *l = t->left, *r = t->right;
+    if (!is_pure(l) || !is_pure(r)) return nullptr;
+    const bool alike = l->op == r->op && (l->op == PLUS || l->op == MINUS || l->op == XORB) && operands_have_type(l) &&
+                       operands_have_type(r) && same_integers(l->type, r->type);
+    if (!alike) return nullptr;
+    const bool right = same_value(l->right, r->right), left = !right && same_value(l->left, r->left);
+    if (!right && !left) return nullptr;
+    if (right) {
+        erase_tree(l->right);
+        erase_tree(r->right);
+        t->left = take_left(l);
+        t->right = take_left(r);
+    } else {
+        erase_tree(l->left);
+        erase_tree(r->left);
+        t->left = take_right(l);
+        t->right = take_right(r);
+    }
+    return simp_node(t, loop);
+}
+
+// -x == -y, ~x rel ~y
+NODE* undo_on_both(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    const bool negations = is_equality(t) && is_unary(l, UMINUS) && is_unary(r, UMINUS);
+    if (!negations && !(is_unary(l, NOTB) && is_unary(r, NOTB))) return nullptr;
+    t->left = take_left(l);
+    t->right = take_left(r);
+    if (!is_equality(t)) t->op = commute_inv[t->op];
+    return simp_node(t, loop);
+}
+
+// (T)x rel (T)y and (T)x rel c, where the cast widens: compared as the narrow type has it.
+NODE* compare_uncast(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (l->op != SCONV || !is_integer(l->left->type) || is_bitfield_access(l->left)) return nullptr;
+    TYPE *narrow = l->left->type->stqs(), *wide = l->type;
+    if (narrow->size < tp->int_t->size || narrow->size >= wide->size) return nullptr;
+    // A negative number cast to unsigned keeps its place in the order only as the unsigned number that it becomes.
+    if (is_signed(narrow) && !is_signed(wide)) return nullptr;
+    if (is_icon(r)) {
+        if (truncate_to_type(r->u.lval, narrow) != r->u.lval) return nullptr; // decided by the bounds
+        r->type = narrow;
+    } else if (r->op == SCONV && same_integers(r->left->type, narrow) && !is_bitfield_access(r->left)) {
+        t->right = take_left(r);
+    } else {
+        return nullptr;
+    }
+    t->left = take_left(l);
+    t->op = with_sign(t->op, narrow->is_unsigned());
+    return simp_node(t, loop);
+}
+
+const RULE compare_rules[] = {decide,           compare_truth_value, order_at_the_end, move_constant_across,
+                              undo_on_constant, test_against_zero,   sign_of_product,  undo_division,
+                              compare_arms,     cancel_common_term,  undo_on_both,     compare_uncast};
+
+// ---- Pointers
+bool is_null(const NODE* t) {
+    while (t->op == PCONV || t->op == ISP2CHAR) t = t->left;
+    return is_icon(t, INT65(0));
+}
+
+NODE* compare_pointers(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (same_value(l, r)) return decided(t, holds_for_equals(t->op));
+    if (!is_equality(t)) return t;
+    if (is_null(r) && pointer_contains_adcon_term(l)) return decided(t, t->op == NEQ);
+    // p + i == p + j, p + i == p: the offsets decide.
+    auto base = [](NODE* p) { return (p->op == PLUS || p->op == MINUS) && p->left->type->is_pointer() ? p->left : p; };
+    auto is_offset_sum = [](const NODE* p) {
+        return p->op == PLUS && p->left->type->is_pointer() && is_integer(p->right->type);
+    };
+    if (!is_offset_sum(l) && !is_offset_sum(r)) return t;
+    if ((base(l) != l && !is_offset_sum(l)) || (base(r) != r && !is_offset_sum(r)) || !is_pure(l) || !is_pure(r) ||
+        !same_value(base(l), base(r)))
+        return t;
+    auto offset = [&](NODE* p) {
+        return is_offset_sum(p) ? coerced(tp->long_t, copy_tree(p->right), loop) : mk_ICON(INT65(0), tp->long_t);
+    };
+    NODE *i = offset(l), *j = offset(r);
+    erase_tree(l);
+    erase_tree(r);
+    return simp_node(to_binary(t, t->op, i, j), loop);
+}
+
+void constant_to_the_right(NODE* t) {
+    auto is_number = [](const NODE* n) { return is_constant(n, ICON) || is_constant(n, FCON); };
+    auto is_null = [](const NODE* n) { return n->op == PCONV && n->left->op == ICON; };
+    if (commute_inv[t->op] == ILLOP || is_number(t->right) || is_null(t->right)) return;
+    if (!is_number(t->left) && !is_null(t->left)) return;
+    std::swap(t->left, t->right);
+    t->op = commute_inv[t->op];
+}
+
+// ---- Two compares under a bit operator
+// (x == 0) & (y == 0) is (x | y) == 0; (x < 0) & (y < 0) is (x & y) < 0; and the like. Other outcomes are the
+// opposites.
+NODE* join_tests_of_zero(NODE* t, struct LOOP* loop) {
+    NODE *a = t->left, *b = t->right;
+    if (a->op != b->op || !op_is_int_compare(a->op) || !is_icon(a->right, INT65(0)) || !is_icon(b->right, INT65(0)) ||
+        !same_integers(a->left->type, b->left->type) || !same_integers(a->left->type, a->right->type))
+        return nullptr;
+    const bool orders = a->op == LT || a->op == GE;
+    if (orders && !is_signed(a->left->type)) return nullptr;
+    int inner = 0;
+    if (t->op == ANDB && a->op == EQ) inner = ORB;
+    if (t->op == ORB && a->op == NEQ) inner = ORB;
+    if (a->op == LT) inner = t->op;
+    if (a->op == GE) inner = t->op == ANDB ? ORB : ANDB;
+    if (!inner) return nullptr;
+    TYPE *operand = a->left->type->stqs(), *type = t->type;
+    NODE* y = b->left;
+    erase_node(b->right);
+    erase_node(b);
+    a->left = made(inner, a->left, y, operand, loop);
+    erase_node(t);
+    return coerce_to_type(type, simp_node(a, loop));
+}
+
+} // namespace
+
+NODE* join_compares(NODE* t, struct LOOP* loop) {
+    return t->op == ANDB || t->op == ORB ? join_tests_of_zero(t, loop) : nullptr;
+}
+
+NODE* simp_relop(NODE* t, struct LOOP* loop) {
+    if (t->type->is_vector() || !t->type->is_int()) return t;
+    constant_to_the_right(t);
+    if (op_is_float_compare(t->op)) return simp_float_relop(t, loop);
+    if (t->left->type->is_pointer() && t->right->type->is_pointer()) return compare_pointers(t, loop);
+    // Widths and signs of both sides must be the compare's: a mixed pair is converted first.
+    if (!same_integers(t->left->type, t->right->type) || t->left->type->size < tp->int_t->size) return t;
+    if (!is_equality(t) && is_unsigned_relop(t->op) != t->left->type->is_unsigned()) return t;
+    return first_that_applies(compare_rules, t, loop);
+}

@@ -1,0 +1,100 @@
+// Bits that matter: a tree under a mask, a shift or a narrowing cast need not compute the others.
+
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/rule.h"
+#include "OPT5/simp/simp.h"
+
+using namespace rules;
+
+namespace {
+
+constexpr int MOST_LEVELS = 6;
+
+class NARROWING {
+public:
+    // A tree that agrees with `t` in the bits of `mask`.
+    NODE* narrow(NODE* t, uint64_t mask, int levels) const {
+        mask &= mask_of(t->type);
+        if (!levels || !is_integer(t->type) || mask == mask_of(t->type) || is_icon(t)) return t;
+        switch (t->op) {
+        case ANDB:
+        case ORB:
+        case XORB: return operands_have_type(t) ? bit_operator(t, mask, levels) : t;
+        case NOTB: return operand_has_type(t) ? left_only(t, mask, levels) : t;
+        case PLUS:
+        case MINUS: return operands_have_type(t) ? sum(t, up_to_highest(mask), levels) : t;
+        case MULT: return operands_have_type(t) ? both(t, up_to_highest(mask), levels) : t;
+        case UMINUS: return operand_has_type(t) ? left_only(t, up_to_highest(mask), levels) : t;
+        case SLL:
+        case SRL: return shift(t, mask, levels);
+        case SCONV: return cast(t, mask, levels);
+        default: return t;
+        }
+    }
+
+private:
+    // A carry only goes upward.
+    static uint64_t up_to_highest(uint64_t mask) {
+        for (int s = 1; s < 64; s *= 2) mask |= mask >> s;
+        return mask;
+    }
+
+    NODE* left_only(NODE* t, uint64_t mask, int levels) const {
+        NODE* former = t->left;
+        t->left = narrow(former, mask, levels - 1);
+        return t->left == former ? t : simp_node(t, nullptr);
+    }
+
+    NODE* both(NODE* t, uint64_t mask, int levels) const {
+        NODE *l = t->left, *r = t->right;
+        t->left = narrow(l, mask, levels - 1);
+        t->right = narrow(r, mask, levels - 1);
+        return t->left == l && t->right == r ? t : simp_node(t, nullptr);
+    }
+
+    NODE* sum(NODE* t, uint64_t mask, int levels) const {
+        const bool idle = is_icon(t->right) && (bits_of(t->right) & mask) == 0;
+        return idle ? narrow(only_left(t), mask, levels - 1) : both(t, mask, levels);
+    }
+
+    NODE* bit_operator(NODE* t, uint64_t mask, int levels) const {
+        if (!is_icon(t->right)) return both(t, mask, levels);
+        const uint64_t c = bits_of(t->right);
+        const KNOWN_BITS k = known_bits(t->left);
+        const bool idle = t->op == ANDB  ? (mask & ~(c | k.zeros)) == 0
+                          : t->op == ORB ? (mask & c & ~k.ones) == 0
+                                         : (mask & c) == 0;
+        if (idle) return narrow(only_left(t), mask, levels - 1);
+        return left_only(t, t->op == ANDB ? mask & c : t->op == ORB ? mask & ~c : mask, levels);
+    }
+
+    NODE* shift(NODE* t, uint64_t mask, int levels) const {
+        const int n = shift_count_of(t);
+        if (!n) return t;
+        if (t->op == SLL) return left_only(t, mask >> n, levels);
+        uint64_t below = (mask << n) & mask_of(t->type);
+        if (is_signed(t->type) && mask & ~(mask_of(t->type) >> n)) below |= sign_bit(t->type);
+        return left_only(t, below, levels);
+    }
+
+    // Between integers. A cast to or from `bool` looks at more than bits; a bit-field is read through its cast.
+    NODE* cast(NODE* t, uint64_t mask, int levels) const {
+        TYPE* from = t->left->type;
+        if (!is_integer(from) || is_bitfield_access(t->left)) return t;
+        NODE* inner = t->left;
+        if (inner->op == SCONV && is_integer(inner->left->type) && !is_bitfield_access(inner->left) &&
+            (mask & ~mask_of(from)) == 0) {
+            TYPE* type = t->type;
+            NODE* operand = take_left(take_left(t));
+            return coerced(type, operand, nullptr);
+        }
+        uint64_t below = mask & mask_of(from);
+        if (mask & ~mask_of(from) && is_signed(from)) below |= sign_bit(from);
+        return left_only(t, below, levels);
+    }
+};
+
+} // namespace
+
+NODE* prop_mask_into_subtree(NODE* t, INT65 mask) { return NARROWING().narrow(t, mask.value, MOST_LEVELS); }

@@ -1,0 +1,176 @@
+// Floating point. A rewrite here gives the same number in every case: signs of zeros, infinities, rounding and NaNs
+// too. Without `strict_fp` a division by any constant is a multiplication by its rounded reciprocal.
+
+#include "OPT5/ir/global.h"
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/fold.h"
+#include "OPT5/simp/rule.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
+
+using namespace rules;
+
+namespace {
+
+constexpr uint16_t INFINITE_EXPONENT = 32767;
+
+bool is_fcon(const NODE* t) { return is_constant(t, FCON); }
+bool is_fcon(const NODE* t, const simul_fval& v) { return is_fcon(t) && f_bit_eq(FCON_value_of_fp_constant(t), &v); }
+bool is_float_operand(const NODE* t, const TYPE* type) { return t->type->is_float() && t->type->size == type->size; }
+bool operands_are(const NODE* t) { return is_float_operand(t->left, t->type) && is_float_operand(t->right, t->type); }
+bool is_negation(const NODE* t, const TYPE* type) {
+    return t->op == UMINUS && is_float_operand(t, type) && is_float_operand(t->left, type);
+}
+
+NODE* number(const simul_fval& v, const NODE* like) {
+    NODE* t = new_node(FCON, like->type->stqs());
+    t->u.fval = new simul_fval(v);
+    t->ls = like->ls;
+    return t;
+}
+
+bool is_power_of_2(const simul_fval& x) {
+    int bits = 0;
+    for (uint16_t word : x.mant) bits += __builtin_popcount(word);
+    return bits == 1 && !f_is_nan(&x) && !f_is_inf(&x) && !f_is_zero(&x);
+}
+
+// 1 / c as the target has it; false where it is no ordinary number.
+bool reciprocal(const simul_fval& c, TYPE* type, simul_fval* r) {
+    if (f_is_zero(&c) || f_is_nan(&c) || f_is_inf(&c)) return false;
+    fp_error = 0;
+    f_div(&one, &c, r);
+    truncate_fval_to_target(r, type);
+    if (fp_error || f_is_nan(r) || f_is_inf(r) || f_is_zero(r)) return false;
+    const int least_exponent = type->size > 32 ? -1022 : -126;
+    if (f_findexp(r) < least_exponent) return false;
+    if (!strict_fp) return true;
+    simul_fval product;
+    f_mul(&c, r, &product);
+    return !fp_error && f_eq(&product, &one) && is_power_of_2(c);
+}
+
+} // namespace
+
+NODE* simp_float_MULT(NODE* t, struct LOOP* loop) {
+    if (!is_fcon(t->right) || !operands_are(t)) return t;
+    const simul_fval& c = *FCON_value_of_fp_constant(t->right);
+    if (f_is_nan(&c)) {
+        NODE* constant = t->right;
+        return mk_COMMAOP(peel_for_effect(take_left(t)), constant);
+    }
+    if (is_fcon(t->right, one)) return only_left(t);
+    if (is_fcon(t->right, neg_one)) {
+        erase_tree(t->right);
+        return simp_node(to_unary(t, UMINUS, t->left), loop);
+    }
+    if (is_fcon(t->right, two) && is_pure(t->left)) {
+        erase_tree(t->right);
+        return simp_node(to_binary(t, PLUS, t->left, copy_tree(t->left)), loop);
+    }
+    return t;
+}
+
+NODE* simp_float_DIV(NODE* t, struct LOOP* loop) {
+    if (t->right->op != FCON || !operands_are(t)) return t;
+    simul_fval r;
+    if (!reciprocal(*t->right->u.fval, t->type, &r)) return t;
+    NODE* factor = number(r, t->right);
+    erase_tree(t->right);
+    t->right = factor;
+    t->op = MULT;
+    return simp_node(t, loop);
+}
+
+// x + -y, x - -y, -x + y, x - 0.0, x + -0.0, -0.0 - x. A zero of the other sign is not the neutral element.
+NODE* simp_float_sum(NODE* t, struct LOOP* loop) {
+    if (!operands_are(t)) return t;
+    if (t->op == PLUS) order_operands(t);
+    if (is_fcon(t->right, t->op == PLUS ? neg_zero : pos_zero)) return only_left(t);
+    if (t->op == MINUS && is_fcon(t->left, neg_zero)) {
+        erase_tree(t->left);
+        return simp_node(to_unary(t, UMINUS, t->right), loop);
+    }
+    if (is_negation(t->right, t->type)) {
+        t->op = t->op == PLUS ? MINUS : PLUS;
+        t->right = take_left(t->right);
+        return simp_node(t, loop);
+    }
+    if (t->op == PLUS && is_negation(t->left, t->type) && is_pure(t->left) && is_pure(t->right)) {
+        NODE* x = take_left(t->left);
+        return simp_node(to_binary(t, MINUS, t->right, x), loop);
+    }
+    return t;
+}
+
+NODE* simp_float_unary(NODE* t) {
+    if (t->op != UMINUS || !is_negation(t->left, t->type)) return t;
+    TYPE* type = t->type;
+    return coerce_to_type(type, take_left(take_left(t)));
+}
+
+// (double)x rel (double)y and (double)x rel c of an x that is float, with a c that is one.
+NODE* simp_float_relop(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    auto widens = [](const NODE* n) {
+        return n->op == SCONV && n->type->is_float() && n->left->type->is_float() &&
+               n->left->type->size < n->type->size;
+    };
+    if (!widens(l)) return t;
+    TYPE* narrow = l->left->type->stqs();
+    if (r->op == FCON && r->type->is_float()) {
+        simul_fval v = *r->u.fval;
+        fp_error = 0;
+        truncate_fval_to_target(&v, narrow);
+        if (fp_error || f_is_nan(&v) || !f_bit_eq(&v, r->u.fval)) return t;
+        if (!f_is_zero(&v) && !f_is_inf(&v) && f_findexp(&v) < -126) return t;
+        NODE* c = new_node(FCON, narrow);
+        c->u.fval = new simul_fval(v);
+        c->ls = r->ls;
+        erase_tree(r);
+        t->right = c;
+    } else if (widens(r) && is_float_operand(r->left, narrow)) {
+        t->right = take_left(r);
+    } else {
+        return t;
+    }
+    t->left = take_left(l);
+    return simp_node(t, loop);
+}
+
+NODE* simp_ABS(NODE* t, struct LOOP* loop) {
+    NODE* x = t->left;
+    const bool is_float = t->type->is_float() && is_float_operand(x, t->type);
+    if (!is_float && !operand_has_type(t)) return t;
+    TYPE* type = t->type;
+    const bool same = is_float ? (x->op == ABS || x->op == UMINUS) && is_float_operand(x->left, type)
+                               : is_unary(x, ABS) || (is_unary(x, UMINUS) && is_signed(type));
+    if (same && x->op == ABS) return coerce_to_type(type, take_left(t));
+    if (same) {
+        t->left = take_left(x);
+        return simp_node(t, loop);
+    }
+    if (is_float) return t;
+    if (tree_is_non_negative(x, loop)) return coerce_to_type(type, take_left(t));
+    if (tree_is_negative(x, loop)) return simp_node(to_unary(t, UMINUS, x), loop);
+    return t;
+}
+
+// The sign of what is squared does not count.
+NODE* simp_SQR(NODE* t, struct LOOP* loop) {
+    NODE* x = t->left;
+    if (x->op != UMINUS && x->op != ABS) return t;
+    const bool fits = t->type->is_float() ? is_float_operand(x, t->type) && is_float_operand(x->left, t->type)
+                                          : operand_has_type(t) && operand_has_type(x);
+    if (!fits) return t;
+    t->left = take_left(x);
+    return simp_node(t, loop);
+}
+
+// 1 / -x is -(1 / x).
+NODE* simp_RECIP(NODE* t, struct LOOP* loop) {
+    if (!t->type->is_float() || !is_negation(t->left, t->type)) return t;
+    t->left = take_left(t->left);
+    TYPE* type = t->type;
+    return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
+}

@@ -1,0 +1,417 @@
+// Sums and differences.
+//
+// Canonical forms: a constant stands outermost and on the right; constants of a chain are one; a signed difference with
+// a constant is a sum with its negative, an unsigned one has the constant of the smaller magnitude; equal terms are one
+// product; a sum with a negation is a difference. Pointers: the pointer stands on the left, the constant outermost.
+
+#include "OPT5/simp/algebra.h"
+#include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/rule.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
+
+using namespace rules;
+
+namespace {
+
+bool is_sum(const NODE* t) { return (t->op == PLUS || t->op == MINUS) && operands_have_type(t); }
+bool has_constant_term(const NODE* t) { return is_sum(t) && is_icon(t->right); }
+INT65 constant_term(const NODE* t) { return t->op == PLUS ? t->right->u.lval : -t->right->u.lval; }
+bool fits_or_wraps(INT65 v, TYPE* type) { return type->is_unsigned() || truncate_to_type(v, type) == v; }
+
+// The node as x + c, in the form that the sign of the type wants.
+NODE* as_constant_sum(NODE* t, NODE* x, INT65 c, NODE* icon) {
+    TYPE* type = t->type;
+    c = truncate_to_type(c, type);
+    const INT65 half = INT65(0, sign_bit(type));
+    const bool subtracts = type->is_unsigned() && c > half;
+    set_icon(icon, subtracts ? -c : c);
+    return to_binary(t, subtracts ? MINUS : PLUS, x, icon);
+}
+
+// ---- Constants
+NODE* drop_zero(NODE* t, struct LOOP*) {
+    if (!is_icon(t->right, INT65(0))) return nullptr;
+    return only_left(t);
+}
+
+NODE* canonical_constant(NODE* t, struct LOOP* loop) {
+    if (!is_icon(t->right)) return nullptr;
+    const int op = t->op;
+    as_constant_sum(t, t->left, constant_term(t), t->right);
+    return t->op != op ? simp_node(t, loop) : nullptr;
+}
+
+// (x + c1) + c2, (c1 - x) + c2. A signed constant that wraps is not made: the sum would always overflow.
+NODE* join_constants(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_icon(t->right) || !is_sum(inner)) return nullptr;
+    if (is_icon(inner->right)) {
+        const INT65 sum = constant_term(inner) + constant_term(t);
+        if (!fits_or_wraps(sum, t->type)) return nullptr;
+        NODE* x = inner->left;
+        erase_node(inner->right);
+        erase_node(inner);
+        return simp_node(as_constant_sum(t, x, sum, t->right), loop);
+    }
+    if (inner->op != MINUS || !is_icon(inner->left)) return nullptr;
+    const INT65 sum = inner->left->u.lval + constant_term(t);
+    if (!fits_or_wraps(sum, t->type)) return nullptr;
+    set_icon(inner->left, sum);
+    return simp_node(only_left(t), loop);
+}
+
+// c1 - (x + c2), c1 - (c2 - x)
+NODE* constant_minus_sum(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->right;
+    if (t->op != MINUS || !is_icon(t->left) || !is_sum(inner)) return nullptr;
+    if (is_icon(inner->right)) {
+        const INT65 c = t->left->u.lval - constant_term(inner);
+        if (!fits_or_wraps(c, t->type)) return nullptr;
+        set_icon(t->left, c);
+        t->right = inner->left;
+        erase_node(inner->right);
+        erase_node(inner);
+        return simp_node(t, loop);
+    }
+    if (inner->op != MINUS || !is_icon(inner->left)) return nullptr;
+    const INT65 c = t->left->u.lval - inner->left->u.lval;
+    if (!fits_or_wraps(c, t->type)) return nullptr;
+    NODE* x = inner->right;
+    erase_node(inner->left);
+    erase_node(inner);
+    return simp_node(as_constant_sum(t, x, c, t->left), loop);
+}
+
+// (x + c) op y and x op (y + c): the constant moves outward.
+NODE* constant_outward(NODE* t, struct LOOP* loop) {
+    if (is_icon(t->right)) return nullptr;
+    const bool on_left = has_constant_term(t->left);
+    if (!on_left && (is_icon(t->left) || !has_constant_term(t->right))) return nullptr;
+    NODE* inner = on_left ? t->left : t->right;
+    INT65 c = constant_term(inner);
+    if (!on_left && t->op == MINUS) c = -c;
+    NODE *x = inner->left, *icon = inner->right;
+    erase_node(inner);
+    NODE* sum = on_left ? made(t->op, x, t->right, t->type, loop) : made(t->op, t->left, x, t->type, loop);
+    return simp_node(as_constant_sum(t, sum, c, icon), loop);
+}
+
+// ---- Negations
+NODE* remove_negations(NODE* t, struct LOOP* loop) {
+    if (t->op == MINUS && is_icon(t->left, INT65(0))) {
+        erase_tree(t->left);
+        return simp_node(to_unary(t, UMINUS, t->right), loop);
+    }
+    if (is_unary(t->right, UMINUS)) {
+        t->op = t->op == PLUS ? MINUS : PLUS;
+        t->right = take_left(t->right);
+        return simp_node(t, loop);
+    }
+    // -x + y. The operands exchange places only where the order of their effects does not show.
+    if (t->op == PLUS && is_unary(t->left, UMINUS) && is_pure(t->left) && is_pure(t->right)) {
+        NODE* x = take_left(t->left);
+        return simp_node(to_binary(t, MINUS, t->right, x), loop);
+    }
+    // x - (y - z) of a constant y is (x + z) - y.
+    NODE* inner = t->right;
+    if (t->op == MINUS && inner->op == MINUS && is_icon(inner->left) && operands_have_type(inner) &&
+        !is_icon(t->left)) {
+        NODE* sum = made(PLUS, t->left, inner->right, t->type, loop);
+        NODE* c = inner->left;
+        erase_node(inner);
+        return simp_node(to_binary(t, MINUS, sum, c), loop);
+    }
+    return nullptr;
+}
+
+// ---- Terms that cancel. What is kept has one operand's effects; the others have none.
+NODE* keep_term(NODE* t, NODE* holder, bool left, bool negative, struct LOOP* loop) {
+    NODE* kept = left ? holder->left : holder->right;
+    (left ? holder->left : holder->right) = nullptr;
+    if (left) std::swap(holder->left, holder->right); // a node's only operand is its left one
+    TYPE* type = t->type;
+    erase_tree(t);
+    return negative ? made(UMINUS, kept, nullptr, type, loop) : kept;
+}
+
+// The term that is left may have effects of its own only where it is not evaluated between the two that cancel.
+NODE* cancel_terms(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (t->op == MINUS && same_value(l, r)) return constant_for(t, INT65(0));
+    if (is_sum(l)) {
+        // (x + y) - y, (x - y) + y: x.  (x + y) - x: y.  (x - y) - x: -y.
+        if (l->op != t->op && same_value(l->right, r)) return keep_term(t, l, true, false, loop);
+        if (t->op == MINUS && same_value(l->left, r) && is_pure(l->right))
+            return keep_term(t, l, false, l->op == MINUS, loop);
+    }
+    if (is_sum(r)) {
+        // x - (x + y): -y.  x - (x - y): y.  x - (y + x): -y.  x + (y - x): y.
+        if (t->op == MINUS && same_value(l, r->left)) return keep_term(t, r, false, r->op == PLUS, loop);
+        if (!is_pure(r->left)) return nullptr;
+        if (t->op == MINUS && r->op == PLUS && same_value(l, r->right)) return keep_term(t, r, true, true, loop);
+        if (t->op == PLUS && r->op == MINUS && same_value(l, r->right)) return keep_term(t, r, true, false, loop);
+    }
+    return nullptr;
+}
+
+// ---- Common factors: x * c1 + x * c2, x + x, x * y + x * z
+struct TERM {
+    NODE* value;
+    INT65 factor;
+};
+
+TERM term_of(NODE* t) {
+    if (is_node_with_icon(t, MULT)) return {t->left, t->right->u.lval};
+    if (t->op == SLL && shift_count_of(t)) return {t->left, INT65(1) << INT65(shift_count_of(t))};
+    return {t, INT65(1)};
+}
+
+NODE* join_equal_terms(NODE* t, struct LOOP* loop) {
+    if (is_icon(t->right) || is_icon(t->left)) return nullptr;
+    const TERM l = term_of(t->left), r = term_of(t->right);
+    if (!same_value(l.value, r.value)) return nullptr;
+    const INT65 factor = t->op == PLUS ? l.factor + r.factor : l.factor - r.factor;
+    NODE *x = copy_tree(l.value), *icon = icon_of(factor, t);
+    TYPE* type = t->type;
+    erase_tree(t);
+    return made(MULT, x, icon, type, loop);
+}
+
+NODE* factor_out(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (!is_node(l, MULT) || !is_node(r, MULT) || !is_pure(l) || !is_pure(r)) return nullptr;
+    for (int side = 0; side < 4; ++side) {
+        NODE *&a = side & 1 ? l->right : l->left, *&b = side & 2 ? r->right : r->left;
+        if (is_icon(a) || !same_value(a, b)) continue;
+        NODE *common = a, *x = side & 1 ? l->left : l->right, *y = side & 2 ? r->left : r->right;
+        if (is_icon(x) != is_icon(y)) return nullptr; // x * c + x * y stays for the pairs of constants
+        erase_tree(b);
+        erase_node(l);
+        erase_node(r);
+        NODE* sum = made(t->op, x, y, t->type, loop);
+        return simp_node(to_binary(t, MULT, common, sum), loop);
+    }
+    return nullptr;
+}
+
+// ---- Bits
+// ~x + c is (c - 1) - x; c - ~x is x + (c + 1).
+NODE* sum_with_complement(NODE* t, struct LOOP* loop) {
+    const bool adds = t->op == PLUS && is_icon(t->right) && is_unary(t->left, NOTB);
+    const bool subtracts = t->op == MINUS && is_icon(t->left) && is_unary(t->right, NOTB);
+    if (!adds && !subtracts) return nullptr;
+    NODE *icon = adds ? t->right : t->left, *x = take_left(adds ? t->left : t->right);
+    const INT65 c = icon->u.lval + (adds ? INT65(-1) : INT65(1));
+    if (!adds) return simp_node(as_constant_sum(t, x, c, icon), loop);
+    set_icon(icon, c);
+    return simp_node(to_binary(t, MINUS, icon, x), loop);
+}
+
+// The operand of the commutative node `t` that isn't `x`; null if neither is.
+NODE* other_operand(const NODE* t, const NODE* x) {
+    return same_value(t->left, x) ? t->right : same_value(t->right, x) ? t->left : nullptr;
+}
+
+// (x | y) - y is x & ~y; x - (x & y) is x & ~y; (x | y) - (x & y) is x ^ y; (x & y) + (x | y) is x + y.
+NODE* sum_of_bits(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (!is_pure(l) || !is_pure(r)) return nullptr;
+    const bool crosses =
+        (is_node(l, ORB) && is_node(r, ANDB)) || (t->op == PLUS && is_node(l, ANDB) && is_node(r, ORB));
+    if (crosses && ((same_value(l->left, r->left) && same_value(l->right, r->right)) ||
+                    (same_value(l->left, r->right) && same_value(l->right, r->left)))) {
+        NODE *x = copy_tree(l->left), *y = copy_tree(l->right);
+        const int op = t->op == PLUS ? PLUS : XORB;
+        TYPE* type = t->type;
+        erase_tree(t);
+        return made(op, x, y, type, loop);
+    }
+    if (t->op != MINUS) return nullptr;
+    const NODE *x = nullptr, *y = nullptr;
+    if (is_node(l, ORB) && (x = other_operand(l, r))) y = r;
+    if (!y && is_node(r, ANDB) && (y = other_operand(r, l))) x = l;
+    if (!x || !y) return nullptr;
+    NODE *kept = copy_tree(x), *masked = copy_tree(y);
+    TYPE* type = t->type;
+    erase_tree(t);
+    return made(ANDB, kept, made(NOTB, masked, nullptr, type, loop), type, loop);
+}
+
+// x - (x / c) * c is x % c; (x / c) * c + x % c is x.
+NODE* remainder(NODE* t, struct LOOP* loop) {
+    auto quotient = [](const NODE* n) {
+        return is_node_with_icon(n, MULT) && is_node_with_icon(n->left, DIV) &&
+               n->right->u.lval == n->left->right->u.lval && !n->right->u.lval.is_zero();
+    };
+    NODE *l = t->left, *r = t->right;
+    if (t->op == MINUS && quotient(r) && same_value(l, r->left->left)) {
+        NODE* c = r->right;
+        erase_tree(r->left);
+        erase_node(r);
+        return simp_node(to_binary(t, MOD, l, c), loop);
+    }
+    if (t->op != PLUS) return nullptr;
+    if (quotient(r)) std::swap(l, r);
+    if (!quotient(l) || !is_node_with_icon(r, MOD) || r->right->u.lval != l->right->u.lval ||
+        !same_value(r->left, l->left->left))
+        return nullptr;
+    return keep_term(t, r, true, false, loop);
+}
+
+const RULE sum_rules[] = {drop_zero,        canonical_constant,  join_constants,   constant_minus_sum,
+                          remove_negations, cancel_terms,        constant_outward, join_equal_terms,
+                          factor_out,       sum_with_complement, sum_of_bits,      remainder};
+
+NODE* simp_integer_sum(NODE* t, struct LOOP* loop) {
+    if (!operands_have_type(t)) return t;
+    if (t->op == PLUS) order_operands(t);
+    t = first_that_applies(sum_rules, t, loop);
+    return t->op == PLUS || t->op == MINUS ? simp_by_known_bits(t) : t;
+}
+
+// ---- Pointers: arithmetic in address units, at the width of an address
+bool is_address_cast(const NODE* t) {
+    return (t->op == PCONV || t->op == ISP2CHAR) && t->left->type->is_pointer() && t->left->type->size == t->type->size;
+}
+bool is_offset(const TYPE* t) { return is_integer(t); }
+bool is_pointer_sum(const NODE* t) {
+    return (t->op == PLUS || t->op == MINUS) && t->type->is_pointer() && t->left->type->is_pointer() &&
+           is_offset(t->right->type);
+}
+
+// (p + c1) + c2, also with casts of the pointer between: one constant.
+NODE* join_offsets(NODE* t, struct LOOP* loop) {
+    if (!is_icon(t->right)) return nullptr;
+    NODE** link = &t->left;
+    while (is_address_cast(*link)) link = &(*link)->left;
+    NODE* inner = *link;
+    if (!is_pointer_sum(inner) || !is_icon(inner->right)) return nullptr;
+    const INT65 sum = constant_term(inner) + constant_term(t);
+    if (truncate_to_type(sum, tp->long_t) != sum) return nullptr;
+    const bool fits = t->right->type->is_signed() && truncate_to_type(sum, t->right->type) == sum;
+    TYPE* type = fits ? t->right->type->stqs() : tp->long_t;
+    erase_tree(t->right);
+    erase_node(inner->right);
+    TYPE* former = inner->type;
+    NODE* p = take_left(inner);
+    *link = compatible_types(p->type, former, true) ? p : coerce_to_type(former, p);
+    t->op = PLUS;
+    t->right = mk_ICON(sum, type);
+    if (is_address_cast(t->left)) t->left = simp_node(t->left, loop);
+    return simp_node(t, loop);
+}
+
+// Whether x op c, computed in its own width, is the same number as computed in an address's.
+bool sum_is_exact(const NODE* t, struct LOOP* loop) {
+    if (t->type->size >= tp->void_ptr_t->size) return true;
+    INT65 min, max;
+    if (!calculate_bounds(t->left, loop, &min, &max)) return false;
+    const INT65 c = constant_term(t);
+    return min + c >= int_type_min(t->type) && max + c <= int_type_max(t->type);
+}
+
+// (p + c) + i is (p + i) + c; so is p + (i + c) where that sum is exact.
+NODE* offset_outward(NODE* t, struct LOOP* loop) {
+    if (is_icon(t->right)) return nullptr;
+    NODE* inner = t->left;
+    if (is_pointer_sum(inner) && is_icon(inner->right)) {
+        std::swap(t->right, inner->right);
+        std::swap(t->op, inner->op);
+        t->left = simp_node(inner, loop);
+        return simp_node(t, loop);
+    }
+    inner = t->right;
+    if (!has_constant_term(inner) || !sum_is_exact(inner, loop)) return nullptr;
+    const INT65 c = t->op == PLUS ? constant_term(inner) : -constant_term(inner);
+    if (truncate_to_type(c, tp->long_t) != c) return nullptr;
+    TYPE *type = t->type,
+         *offset = inner->type->is_signed() && truncate_to_type(c, inner->type) == c ? inner->type->stqs() : tp->long_t;
+    erase_node(inner->right);
+    t->right = take_left(inner);
+    return made(PLUS, simp_node(t, loop), mk_ICON(c, offset), type, loop);
+}
+
+// The pointer on the left, a positive operator where that is one: i + p, p + -i, p - c.
+NODE* canonical_pointer_sum(NODE* t, struct LOOP* loop) {
+    if (t->op == PLUS && t->right->type->is_pointer() && is_offset(t->left->type)) {
+        if (!is_steady_leaf(t->left) && !is_steady_leaf(t->right) && !(is_pure(t->left) && is_pure(t->right)))
+            return nullptr;
+        std::swap(t->left, t->right);
+        return simp_node(t, loop);
+    }
+    if (!is_pointer_sum(t)) return nullptr;
+    if (is_icon(t->right, INT65(0))) return only_left(t);
+    if (t->op == MINUS && is_icon(t->right)) {
+        const INT65 c = -t->right->u.lval;
+        if (t->right->type->is_signed() && truncate_to_type(c, t->right->type) == c) {
+            t->op = PLUS;
+            t->right->u.lval = c;
+            return simp_node(t, loop);
+        }
+    }
+    // The negation must be exact to be a negation of the address's own width.
+    if (is_unary(t->right, UMINUS) && (t->right->type->size >= tp->void_ptr_t->size || is_signed(t->right->type)) &&
+        (t->right->type->size >= tp->void_ptr_t->size ||
+         tree_is_not_ivalue(t->right->left, int_type_min(t->right->type), loop))) {
+        t->op = t->op == PLUS ? MINUS : PLUS;
+        t->right = take_left(t->right);
+        return simp_node(t, loop);
+    }
+    return nullptr;
+}
+
+const RULE pointer_rules[] = {canonical_pointer_sum, join_offsets, offset_outward};
+
+// ---- Differences of pointers, in address units
+const NODE* base_of(const NODE* t) {
+    while (is_address_cast(t)) t = t->left;
+    return t;
+}
+
+NODE* offset_as_long(NODE* sum, struct LOOP* loop) {
+    NODE* offset = coerced(tp->long_t, copy_tree(sum->right), loop);
+    return sum->op == MINUS ? made(UMINUS, offset, nullptr, tp->long_t, loop) : offset;
+}
+
+// (p + i) - (p + j) is i - j; (p + c) - q is (p - q) + c.
+NODE* simp_pointer_difference(NODE* t, struct LOOP* loop) {
+    if (t->type->size != tp->long_t->size || !is_integer(t->type)) return t;
+    const NODE *l = base_of(t->left), *r = base_of(t->right);
+    NODE *a = const_cast<NODE*>(l), *b = const_cast<NODE*>(r);
+    const bool l_is_sum = is_pointer_sum(l), r_is_sum = is_pointer_sum(r);
+    if (!is_pure(l) || !is_pure(r)) return t;
+    if (same_value(l, r)) return constant_for(t, INT65(0));
+    TYPE* type = t->type;
+    NODE* value = nullptr;
+    if (l_is_sum && r_is_sum && same_value(base_of(l->left), base_of(r->left)))
+        value = made(MINUS, offset_as_long(a, loop), offset_as_long(b, loop), tp->long_t, loop);
+    else if (l_is_sum && same_value(base_of(l->left), r))
+        value = offset_as_long(a, loop);
+    else if (r_is_sum && same_value(l, base_of(r->left)))
+        value = made(UMINUS, offset_as_long(b, loop), nullptr, tp->long_t, loop);
+    if (value) {
+        erase_tree(t);
+        return coerce_to_type(type, value);
+    }
+    return t;
+}
+
+NODE* simp_address(NODE* t, struct LOOP* loop) {
+    if (t->left->type->is_pointer() && t->right->type->is_pointer())
+        return t->op == MINUS ? simp_pointer_difference(t, loop) : t;
+    return t->type->is_pointer() ? first_that_applies(pointer_rules, t, loop) : t;
+}
+
+bool has_pointer(const NODE* t) {
+    return t->type->is_pointer() || t->left->type->is_pointer() || t->right->type->is_pointer();
+}
+
+NODE* simp_sum(NODE* t, struct LOOP* loop) {
+    return has_pointer(t) ? simp_address(t, loop) : simp_integer_sum(t, loop);
+}
+
+} // namespace
+
+NODE* simp_PLUS(NODE* t, struct LOOP* loop) { return simp_sum(t, loop); }
+NODE* simp_MINUS(NODE* t, struct LOOP* loop) { return simp_sum(t, loop); }

@@ -95,13 +95,16 @@ def swapped_branch(data):
 
 def stale_alias(data):
     """The last load of `seen` takes the value from before the store through the pointer, kept in `old`."""
-    locals_ = []
-    for kind, start, end in records(data):
+    functions = []  # where each begins, and the names of its locals in the order of their numbers
+    for kind, start, _ in records(data):
         if kind == BEGIN_FUNCTION:
-            locals_ = []  # main is the last function
-        elif kind == SYMBOL and data[start] != ord("_"):
-            locals_.append(bytes(data[start:data.index(0, start)]).decode())
-    loads = [end for start, end in nodes(data, NAME) if data[end - 2:end] == bytes([2, locals_.index("seen")])]
+            functions.append((start, []))
+        elif kind == SYMBOL and functions and data[start] != ord("_"):
+            functions[-1][1].append(bytes(data[start:data.index(0, start)]).decode())
+    (first, locals_), = ((start, names) for start, names in functions if "seen" in names)
+    last = min((start for start, _ in functions if start > first), default=len(data))
+    loads = [end for start, end in nodes(data, NAME)
+             if first < start < last and data[end - 2:end] == bytes([2, locals_.index("seen")])]
     data[loads[-1] - 1] = locals_.index("old")
 
 

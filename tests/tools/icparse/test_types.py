@@ -104,6 +104,17 @@ class Conversions(unittest.TestCase):
         self.assertEqual(initializer("float x = 1e-45f;", "_x"), [f"{2**-149}:float"])
 
 
+    def test_complex_numbers_are_two_parts(self):
+        self.assertEqual(initializer("float _Complex z = 1.5f;", "_z"), ["1.5:float", "0.0:float"])
+        self.assertEqual(initializer("float _Complex z = -__builtin_complex(1.0f, 2.0f) * 2;", "_z"),
+                         ["-2.0:float", "-4.0:float"])
+
+    def test_attributes_mean_nothing(self):
+        source = "{} unsigned long n {} = 4;"
+        self.assertEqual(initializer(source.format("__attribute__((used))", "__attribute__((aligned(8), section(\"s\")))"),
+                                     "_n"), initializer(source.format("", ""), "_n"))
+
+
 class WrongTypes(unittest.TestCase):
     def test_positions(self):
         cases = [
@@ -118,6 +129,10 @@ class WrongTypes(unittest.TestCase):
             ("long long unsigned float x;", "t.c:1:1: error: 'long long unsigned float' is not a type"),
             ("int g(void); void f(void) { int v[g()]; }",
              "t.c:1:33: error: the array size is no constant; arrays of variable length are not supported"),
+            ("long double _Complex z;", "t.c:1:1: error: 'long double _Complex' is not supported"),
+            ("float _Complex z; int f(void) { return z < z; }",
+             "t.c:1:40: error: operator < cannot take 'float _Complex' and 'float _Complex'"),
+            ("float _Complex z; void f(void) { z++; }", "t.c:1:34: error: operator ++ cannot take 'float _Complex'"),
         ]
         for text, expected in cases:
             with self.subTest(text):

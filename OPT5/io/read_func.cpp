@@ -108,9 +108,10 @@ void OPT_CLIENT::cl_label(uint32_t label) {
 }
 
 void OPT_CLIENT::cl_inline_asm(const char* text, PSN* psn) {
-    if (lex == 0)
+    if (lex == 0) {
+        program.assembly.push_back(text);
         wrasmr(IFR_ASM, text, psn);
-    else
+    } else
         append(mk_ASM(IFR_ASM, text), psn);
 }
 

@@ -6,7 +6,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/simp/symbolic.h"
 
-constexpr int MOST_GIVENS = 64; // looked at for one question
+constexpr int MOST_GIVENS = 64, MOST_FACT_LEVELS = 8; // looked at for one question, and in one of them
 
 template <class VISIT>
 void visit_given(const NODE* fact, bool holds, int levels, VISIT&& visit) {
@@ -33,7 +33,7 @@ void for_each_given(struct LOOP* loop, VISIT&& visit) {
     int left = MOST_GIVENS;
     auto visit_all = [&](const std::vector<NODE*>& facts) {
         for (const NODE* fact : facts)
-            if (left-- > 0) visit_given(fact, true, 8, visit);
+            if (left-- > 0) visit_given(fact, true, MOST_FACT_LEVELS, visit);
     };
     if (loop_seams.givens)
         for (; loop; loop = loop_seams.parent ? loop_seams.parent(loop) : nullptr) visit_all(loop_seams.givens(loop));

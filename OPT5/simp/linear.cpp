@@ -5,20 +5,10 @@
 
 namespace {
 
-constexpr int MOST_PURE_NODES = 200;
+constexpr int MOST_PURE_NODES = 48;
 
 bool is_number(const TYPE* t) { return has_value_range(t) || t->is_pointer(); }
 bool is_plain_integer(const TYPE* t) { return has_value_range(t) && !t->is_bool() && !t->is_enum(); }
-
-bool is_pure(const NODE* t, int* nodes_left) {
-    for (; t; t = t->left) {
-        if (--*nodes_left < 0 || side_effects[t->op] || op_is_intrinsic(t->op)) return false;
-        if ((t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF) && lvalue_is_volatile(t))
-            return false;
-        if (!is_pure(t->right, nodes_left)) return false;
-    }
-    return true;
-}
 
 bool extends_alike(const TYPE* a, const TYPE* b) {
     if (a->size != b->size) return false;
@@ -29,9 +19,19 @@ bool extends_alike(const TYPE* a, const TYPE* b) {
 
 } // namespace
 
+bool is_pure_within(const NODE* t, int* nodes_left) {
+    for (; t; t = t->left) {
+        if (--*nodes_left < 0 || side_effects[t->op] || op_is_intrinsic(t->op)) return false;
+        if ((t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF) && lvalue_is_volatile(t))
+            return false;
+        if (!is_pure_within(t->right, nodes_left)) return false;
+    }
+    return true;
+}
+
 bool is_small_and_pure(const NODE* t) {
     int nodes_left = MOST_PURE_NODES;
-    return is_pure(t, &nodes_left);
+    return is_pure_within(t, &nodes_left);
 }
 
 bool LINEAR::takes(const NODE* tree) {
@@ -48,7 +48,7 @@ LINEAR::LINEAR(const NODE* tree, struct LOOP* in) : loop(in) {
 void LINEAR::subtract(const NODE* tree) {
     complete = complete && takes(tree) && tree->type->size == bits;
     if (!complete) return;
-    nodes_left = 64;
+    nodes_left = MOST_NODES;
     add(tree, ~uint64_t(0));
 }
 

@@ -8,7 +8,7 @@
 
 class LINEAR {
 public:
-    static constexpr int MOST_TERMS = 8;
+    static constexpr int MOST_TERMS = 8, MOST_NODES = 32;
     struct TERM {
         const NODE* tree; // borrowed; its value extends by the sign of its own type
         uint64_t coef;    // modulo 2^64
@@ -42,7 +42,7 @@ private:
     struct LOOP* loop;
     unsigned bits = 0;
     TERM terms[MOST_TERMS];
-    int count = 0, nodes_left = 64;
+    int count = 0, nodes_left = MOST_NODES;
     uint64_t constant = 0;
     bool complete = false;
 };

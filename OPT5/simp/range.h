@@ -47,6 +47,7 @@ bool is_same_value(const NODE* a, const NODE* b);
 
 // Neither writes nor reads what is volatile, and has few enough nodes to have been looked at.
 bool is_small_and_pure(const NODE* t);
+bool is_pure_within(const NODE* t, int* nodes_left); // counts the nodes that it looks at
 
 const NODE* without_wrappers(const NODE* t); // SSA operators and marks that stand for their operand
 

@@ -15,7 +15,7 @@ LOOP_SEAMS loop_seams;
 
 namespace {
 
-constexpr int MOST_LEVELS = 4; // of operators that are looked through for a value other than zero
+constexpr int MOST_LEVELS = 3; // of operators that are looked through for a value other than zero
 
 // A product beyond so many levels of questions about products counts as one that may overflow.
 constexpr int MOST_PRODUCT_LEVELS = 8;

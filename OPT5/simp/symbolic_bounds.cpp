@@ -66,7 +66,7 @@ bool is_same_value(const NODE* a, const NODE* b) {
 
 namespace {
 
-constexpr int MOST_NODES = 160, MOST_BUILTIN_LEVELS = 3;
+constexpr int MOST_NODES = 64, MOST_BUILTIN_LEVELS = 3, MOST_GIVEN_LEVELS = 2;
 thread_local int builtin_levels = 0;
 
 constexpr WIDE NO_BOUND = WIDE(1) << 120; // beyond every product that is worked with
@@ -125,9 +125,9 @@ public:
         const RANGE limits = range_of_type(t->type);
         if (--nodes_left < 0) return limits;
         RANGE r = both(limits, structural(t));
-        if (uses_givens && !in_given)
-            for_each_given(loop, [&](const NODE* fact, bool holds) { r = by_fact(r, t, fact, holds); });
-        for (const FACT* f = facts; f; f = f->next) r = by_fact(r, t, f->condition, f->holds);
+        auto narrow = [&](const NODE* fact, bool holds) { r = by_fact(r, t, fact, holds); };
+        if (uses_givens && given_levels < MOST_GIVEN_LEVELS) for_each_given(loop, narrow);
+        for (const FACT* f = facts; f; f = f->next) visit_given(f->condition, f->holds, MOST_FACT_LEVELS, narrow);
         return r;
     }
 
@@ -165,13 +165,10 @@ private:
             op = commute_inv[op];
             other = fact->left;
         }
-        const bool was_in_given = in_given;
-        const FACT* const outer = facts;
-        in_given = true; // what is known of the other side by its form alone
-        facts = nullptr;
+        if (given_levels == MOST_GIVEN_LEVELS) return r;
+        ++given_levels; // what is known of the other side must not lead back to this one for ever
         r = narrowed(r, op, of(other));
-        in_given = was_in_given;
-        facts = outer;
+        --given_levels;
         return r;
     }
 
@@ -302,12 +299,12 @@ private:
     RANGE chosen(const NODE* t) {
         if (t->right->op != COLON) return range_of_type(t->type);
         const NODE* condition = without_wrappers(t->left);
-        const bool tells = is_small_and_pure(condition);
+        const bool tells = is_pure_within(condition, &pure_nodes_left);
         auto arm = [&](const NODE* a, bool holds) {
             const FACT fact{condition, holds, facts};
             const FACT* const outer = facts;
             // What the arm writes before it reads is another value.
-            if (tells && is_small_and_pure(a)) facts = &fact;
+            if (tells && is_pure_within(a, &pure_nodes_left)) facts = &fact;
             const RANGE r = operand(a, t->type);
             facts = outer;
             return r;
@@ -393,9 +390,10 @@ private:
     }
 
     struct LOOP* const loop;
-    bool uses_givens, in_given = false;
+    bool uses_givens;
+    int given_levels = 0;
     const FACT* facts = nullptr;
-    int nodes_left = MOST_NODES;
+    int nodes_left = MOST_NODES, pure_nodes_left = 2 * MOST_NODES;
 };
 
 RANGE range_of_bits(const KNOWN_BITS& k, const TYPE* t) {

@@ -15,7 +15,7 @@ namespace {
 
 using FACTOR = uint64_t; // of a magnitude
 
-constexpr int MOST_NODES = 160;
+constexpr int MOST_NODES = 64, MOST_RANGES = 6; // looked at for one factor
 
 FACTOR gcd(FACTOR a, FACTOR b) {
     while (b) {
@@ -86,7 +86,8 @@ private:
     // The factor of an operator's exact result, for the value that the operator gives.
     FACTOR of_result(const NODE* t, FACTOR f) {
         if (power_of_2_in(f) == f && trailing_zeros(f) < t->type->size) return f;
-        if (f && ((trusts_signed && wraps_signed(t->type)) || operation_is_exact(t, loop))) return f;
+        if (f && ((trusts_signed && wraps_signed(t->type)) || (--ranges_left >= 0 && operation_is_exact(t, loop))))
+            return f;
         return after_wrap(f, static_cast<unsigned>(t->type->size));
     }
 
@@ -125,9 +126,10 @@ private:
         const FACTOR f = of(operand);
         if (to->is_bool() || to->is_enum()) return f == 0 ? 0 : 1;
         const bool is_wide_enough = range_of_type(operand->type).is_within(range_of_type(to));
-        if (is_wide_enough || power_of_2_in(f) == f || !range_of_tree(operand, loop).is_within(range_of_type(to)))
-            return is_wide_enough ? f : after_wrap(f, static_cast<unsigned>(to->size));
-        return f;
+        if (is_wide_enough) return f;
+        const bool keeps_value =
+            power_of_2_in(f) != f && --ranges_left >= 0 && range_of_tree(operand, loop).is_within(range_of_type(to));
+        return keeps_value ? f : after_wrap(f, static_cast<unsigned>(to->size));
     }
 
     FACTOR structural(const NODE* t) {
@@ -176,7 +178,7 @@ private:
 
     struct LOOP* const loop;
     const bool trusts_signed;
-    int nodes_left = MOST_NODES;
+    int nodes_left = MOST_NODES, ranges_left = MOST_RANGES;
 };
 
 // From the terms of the tree as a sum.
@@ -308,8 +310,9 @@ bool expr_cannot_divide_expr(const NODE* a, const NODE* b, struct LOOP* loop) {
     const WIDE most = std::max(y.max, -y.min),
                least = x.holds(0) ? WIDE(0) : std::min(x.min > 0 ? x.min : -x.max, WIDE(1) << 64);
     if (most < least) return true;
-    const FACTOR f = factor_of(a, loop, false);
-    return f > 1 && expr_modulo_constant(b, b->type, INT65(0, f), loop) > INT65(0);
+    // Modulo what divides both a and the differences of b's values.
+    const INT65 m = long_gcd(INT65(0, factor_of(a, loop, false)), max_ICON_delta(b, nullptr));
+    return m > INT65(1) && expr_modulo_constant(b, b->type, m, loop) > INT65(0);
 }
 
 namespace {

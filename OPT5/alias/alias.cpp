@@ -126,6 +126,7 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
         TYPE *type_a = true_type(a, &exact_a), *type_b = true_type(b, &exact_b);
         if (!types_may_be_aliased(type_a, exact_a, type_b, exact_b)) return false;
     }
+    if (loop && p && q && build_the_umults_alias_free_by_predication_lists(a, b, loop)) return false;
     if (unsure) *unsure = true;
     return true;
 }
@@ -216,6 +217,17 @@ void add_antialiasing_loop_assertion(const NODE* p, const NODE* q, struct LOOP* 
     struct LOOP* loop = innermost_common_loop(loop_p, loop_q);
     if (!loop) return;
     hooks.add(loop, make_ANTIALIASED_ICALL(copy_tree(bare_pointer(p)), copy_tree(bare_pointer(q))));
+}
+
+bool build_the_umults_alias_free_by_predication_lists(const NODE* a, const NODE* b, struct LOOP* loop) {
+    if (!loop_assertion_hooks.predicate_disjointness) return false;
+    const bool added = loop_assertion_hooks.predicate_disjointness(a, b, loop);
+    if (print_debug) {
+        debug_printf(added ? "Adding an alias assertion that %s and" : "Failing to add alias assertion that %s and",
+                     tree_to_infix(a).c_str());
+        debug_printf("  %s don't share memory\n", tree_to_infix(b).c_str());
+    }
+    return added;
 }
 
 // ---- Shapes

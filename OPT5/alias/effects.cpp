@@ -9,6 +9,8 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/target/bif.h"
 
+#include <cstring>
+
 namespace {
 
 bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
@@ -50,6 +52,8 @@ struct CALL_BITS {
 constexpr CALL_BITS WRITES = {FUN_no_global_asg, FUN_no_ind_asg};
 constexpr CALL_BITS READS = {FUN_no_global_use, FUN_no_ind_use};
 
+bool keeps_pointers(const FUNINFO* f) { return !std::strcmp(skip_name_prefix(f->name.c_str()), "strtok"); }
+
 bool callee_may_access(const NODE* call, const NODE* lvalue, const CALL_BITS& bits, bool writes) {
     FUNINFO* f = find_FUNINFO_for_call(call);
     const uint64_t flags = f ? get_flags(f) : 0;
@@ -61,8 +65,8 @@ bool callee_may_access(const NODE* call, const NODE* lvalue, const CALL_BITS& bi
     if (object->level > 0 && !is_reached) return false;
     if (object->level == 0 && !(flags & bits.no_global)) return true;
     if (!is_reached || flags & bits.no_indirect) return false;
-    // The library keeps no pointers to objects of the program but in what it was handed.
-    if (flags & FUN_is_SYSTEM && flags & bits.no_global)
+    // The library keeps no pointers into objects of the program from one call to the next.
+    if (flags & FUN_is_SYSTEM && flags & bits.no_global && !keeps_pointers(f))
         return any_argument_reaches(call, lvalue, f->symbol, writes) && (!writes || call_assigns_thru_byref_args(call));
     return true;
 }
@@ -83,7 +87,7 @@ bool call_may_access(const NODE* call, const NODE* lvalue, const CALL_BITS& bits
     switch (call->op) {
     case CALL:
     case UCALL: return callee_may_access(call, lvalue, bits, writes);
-    case ICALL:
+    case ICALL: return !writes && any_argument_reaches(call, lvalue, nullptr, false);
     case UICALL: return false; // a value of its operands
     case MEMCPY: return copy_may_access(call, lvalue, writes);
     default: return machine_call_may_access(call, lvalue);
@@ -183,6 +187,7 @@ bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t) {
     if (any_lvalue_read(t, [a](const NODE* lvalue) { return tree_modifies_lvalue(a, lvalue); })) return true;
     // What a call in `t` reads is not in the tree.
     return any_subtree(t, [a](const NODE* call) {
+        if (call->op == ICALL) return any_argument_reaches(call, nullptr, nullptr, false) && tree_has_side_effects(a);
         if (!op_is_call(call->op) && call->op != MCALL && call->op != UMCALL && call->op != MEMCPY) return false;
         FUNINFO* f = find_FUNINFO_for_call(call);
         return !(f && TEST_FLAG(f, FUN_is_pure_fun)) && tree_has_side_effects(a);

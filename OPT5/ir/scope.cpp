@@ -198,6 +198,14 @@ PTR* find_or_make_PTR_entry(NODE* tree) {
     return find_or_make_PTR_entry(tree->u.sym, member);
 }
 
+void copy_PTR_entry(SYMTAB* to, SYMTAB* from) {
+    const PTR* original = find_or_make_PTR_entry(from);
+    PTR* copy = find_or_make_PTR_entry(to);
+    if (!original || !copy) return;
+    copy->scope = original->scope;
+    copy->flags = original->flags & ~(PTR_IS_A_ROOT | PTR_IS_BOTTOM);
+}
+
 LS* true_scope(const NODE* tree) {
     const NODE* t = tree;
     while (t && (t->op == STDOT || t->op == SSA_USE || t->op == SSA_DEF || t->op == SSA_MU || t->op == SSA_CHI)) t = t->left;

@@ -84,4 +84,6 @@ struct LS {
 // The record of a pointer expression (a NAME, UMULT(UAND(NAME)), a STDOT of such), made on first use; null for other shapes.
 PTR* find_or_make_PTR_entry(NODE* tree);
 PTR* find_or_make_PTR_entry(SYMTAB* sym, fkMDATA* member = nullptr);
+// Gives the copy of a pointer variable what is known of the variable, but for the group, which is built anew.
+void copy_PTR_entry(SYMTAB* to, SYMTAB* from);
 LS* true_scope(const NODE* tree);

@@ -1,12 +1,12 @@
 // Random trees through the simplifier: what comes out must have the value and the side effects of what went in.
 //
-//   simpfuzz [--count N] [--seed S] [--jobs J] [--assignments N] [--depth N] [--most N] [--strict] [--no-floats]
-//   [--no-pointers]
-//            [--no-effects] [--show]
+//   simpfuzz [--count N] [--seed S] [--jobs J] [--assignments N] [--depth N] [--most N] [--thorough] [--strict]
+//            [--no-floats] [--no-pointers] [--no-effects] [--show]
 //
 // Tree number n of a run has the seed S + n, so that `--count 1 --seed X` shows a finding again. Each finding is cut
-// down to a small tree. `--strict` also reports trees that a second simplification changes. `--show` prints each tree
-// and what became of it. The status is 1 if there was a finding.
+// down to a small tree. All checks but the first take turns unless `--thorough` is said. `--strict` also reports trees
+// that a second simplification changes. `--show` prints each tree and what became of it. The status is 1 if there was a
+// finding.
 
 #include "tools/treecheck/campaign.h"
 
@@ -23,9 +23,9 @@ using namespace treecheck;
 namespace {
 
 [[noreturn]] void usage() {
-    fprintf(stderr,
-            "usage: simpfuzz [--count N] [--seed S] [--jobs J] [--assignments N] [--depth N] [--most N] [--strict]\n"
-            "                [--no-floats] [--no-pointers] [--no-effects] [--show]\n");
+    fprintf(stderr, "usage: simpfuzz [--count N] [--seed S] [--jobs J] [--assignments N] [--depth N] [--most N] "
+                    "[--thorough] [--strict]\n"
+                    "                [--no-floats] [--no-pointers] [--no-effects] [--show]\n");
     exit(2);
 }
 
@@ -57,6 +57,8 @@ WORDS arguments(int argc, char** argv) {
             c.trees.depth = std::max(2, static_cast<int>(number()));
         else if (word == "--most")
             c.most_findings = static_cast<int>(number());
+        else if (word == "--thorough")
+            c.thorough = true;
         else if (word == "--strict")
             c.strict = true;
         else if (word == "--show")

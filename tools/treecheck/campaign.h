@@ -10,8 +10,9 @@ namespace treecheck {
 
 struct CAMPAIGN {
     uint64_t seed = 1, count = 100000;
-    int assignments = 12;
+    int assignments = 10;
     int most_findings = 10; // the run ends after so many
+    bool thorough = false;  // every check on every tree; otherwise all but the first take turns
     bool strict = false;    // also reports trees that a second simplification changes
     bool show = false;
     GENERATOR_OPTIONS trees;

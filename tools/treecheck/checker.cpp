@@ -42,6 +42,32 @@ NODE* peeled(NODE* t, struct LOOP*) { return peel_for_effect(t); }
 NODE* simplified_and_peeled(NODE* t, struct LOOP* loop) { return peel_for_effect(simp_tree(t, loop)); }
 NODE* folded(NODE* t, struct LOOP*) { return fold_constants(t); }
 
+NODE* reassociated(NODE* t, struct LOOP* loop) { return simp_assoc(simp_tree(t, loop), loop); }
+NODE* as_address(NODE* t, struct LOOP* loop) { return simp_ss_tree(t, loop); }
+
+// By one of the variables, in front.
+NODE* bubbled(NODE* t, struct LOOP*) {
+    NODE* term = nullptr;
+    for_each_node(t, [&](NODE* n) {
+        if (n->op == NAME && n->type->is_scalar() && !n->type->is_volatile()) term = n;
+    });
+    if (!term) return t;
+    term = copy_tree(term);
+    t = bubble_term_to_top(t, term);
+    erase_tree(term);
+    return t;
+}
+
+bool is_integer(const NODE* t) { return t->type->is_int() && !t->type->is_bool(); }
+template <uint64_t MASK>
+NODE* masked(NODE* t, struct LOOP* loop) {
+    return prop_mask_into_subtree(simp_tree(t, loop), INT65(0, MASK));
+}
+template <uint64_t MASK>
+bool same_bits(BITS expected, const FORM& before, BITS value, const FORM& after) {
+    return before == after && ((expected ^ value) & MASK) == 0;
+}
+
 } // namespace
 
 const OPERATION mandatory_casts = {"casts", is_no_assignment, put_casts_in, nullptr, true};
@@ -55,6 +81,13 @@ const std::vector<OPERATION> operations = {
     {"peel", nullptr, peeled, nullptr, false},
     {"peel after simp", nullptr, simplified_and_peeled, nullptr, false},
     {"fold", nullptr, folded, nullptr, true},
+    {"assoc", nullptr, reassociated, nullptr, true},
+    {"address", nullptr, as_address, nullptr, true},
+    {"bubble", nullptr, bubbled, nullptr, true},
+    {"mask 1", is_integer, masked<1>, same_bits<1>, true},
+    {"mask ff", is_integer, masked<0xFF>, same_bits<0xFF>, true},
+    {"mask 8000", is_integer, masked<0x8000>, same_bits<0x8000>, true},
+    {"mask ff00ffff0", is_integer, masked<0xFF00FFFF0>, same_bits<0xFF00FFFF0>, true},
 };
 
 // ---- Contents of variables

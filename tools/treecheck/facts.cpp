@@ -149,6 +149,7 @@ private:
     void expect_result(const char* question, NODE* result, HOLDS&& holds) {
         const bool was_right = wrong.empty();
         EVALUATOR e;
+        e.null_is_passed = true;
         expect(question, [&](const RUN& r) {
             trial.begin(&e, r.assignment);
             const BITS v = e.eval(result);

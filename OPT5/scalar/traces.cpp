@@ -1,7 +1,6 @@
 // Cases, traces, superblocks and profile.
 #include "OPT5/scalar/simpcfg.h"
 
-void optimize_SWITCH_cases() {}
 void straighten_traces_in_cfg() {}
 void straighten_cond_paths() {}
 void optimize_superblocks_in_cfg() {}

@@ -12,6 +12,7 @@
 // that is about to be replaced waits for the next round.
 #include "OPT5/scalar/fcp.h"
 
+#include "OPT5/alias/address_form.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
@@ -30,6 +31,10 @@
 
 namespace {
 
+bool is_plain_scalar(const TYPE* t) {
+    return (t->is_int() || t->is_enum() || t->is_float() || t->is_pointer()) && !t->is_volatile() && !t->is_vector();
+}
+
 bool keeps_its_initial_value(const SYMTAB* sym) {
     if (sym->level != 0 || !sym->type->is_scalar() || sym->type->is_volatile() || sym->type->is_complex()) return false;
     if (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF) return false;
@@ -39,33 +44,64 @@ bool keeps_its_initial_value(const SYMTAB* sym) {
     return file_symbols_are_known && (sym->cqual & USES) == CQ_REFERENCED;
 }
 
-NODE* initial_value(const NODE* name) {
+NODE* initial_value_of_name(const NODE* name) {
     const SYMTAB* sym = name->u.sym;
     if (name->type->is_volatile() || !keeps_its_initial_value(sym)) return nullptr;
-    NODE* value = sym->init_value ? copy_tree(sym->init_value) : lookup_autoinit(name);
+    return sym->init_value ? copy_tree(sym->init_value) : lookup_autoinit(name);
+}
+
+// A constant place in an object whose content there is fixed: an element of a table.
+NODE* initial_content(const NODE* access) {
+    const SYMTAB* sym = object_name_if_known(access);
+    if (!sym || sym->level != 0 || (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF)) return nullptr;
+    if (!sym->autoinit || sym->dynamic_init || !sym->type->is_const() || lvalue_is_volatile(access)) return nullptr;
+    if (!is_plain_scalar(access->type)) return nullptr;
+    const ADDRESS_FORM place = address_form(access);
+    if (place.object != sym || !place.terms.empty() || place.offset.is_negative()) return nullptr;
+    if (place.width != INT65(static_cast<int64_t>(access->type->size))) return nullptr; // a bit-field
+    const int64_t at = place.offset.fits_in<int64_t>(), width = static_cast<int64_t>(access->type->size);
+    if (at + width > static_cast<int64_t>(sym->size)) return nullptr;
+    if (!symbol_is_immutable(sym) && !bits_of_var_are_immutable(sym->type, at, width)) return nullptr;
+    return lookup_autoinit(sym, static_cast<uint64_t>(at), access->type);
+}
+
+NODE* initial_value(const NODE* tree) {
+    const bool is_name = tree->op == NAME;
+    if (is_name ? !tree->u.sym : tree->op != UMULT && tree->op != STDOT) return nullptr;
+    NODE* value = is_name ? initial_value_of_name(tree) : initial_content(tree);
     if (!value) return nullptr;
-    if (expr_is_propagable(value, 2)) return coerce_to_type(name->type->stqs(), value);
+    if (expr_is_propagable(value, 2)) return coerce_to_type(tree->type->stqs(), value);
     erase_tree(value);
     return nullptr;
 }
 
-} // namespace
-
-namespace {
+void subst_globals_in_address(NODE* place, bool* changed);
 
 NODE* subst_globals(NODE* tree, bool* changed) {
     if (!tree) return tree;
-    if (tree->op == NAME) {
-        NODE* value = tree->u.sym ? initial_value(tree) : nullptr;
-        if (!value) return tree;
+    if (NODE* value = initial_value(tree)) {
         *changed = true;
         erase_tree(tree);
         return value;
     }
-    const bool left_is_place = opcode_is_ASG(tree->op) || tree->op == UAND || tree->op == ARGREF || tree->op == STDOT;
-    if (!left_is_place || (tree->left && tree->left->op != NAME)) tree->left = subst_globals(tree->left, changed);
+    if (tree->left) {
+        const bool left_is_place =
+            opcode_is_ASG(tree->op) || tree->op == UAND || tree->op == ARGREF || tree->op == STDOT;
+        if (left_is_place)
+            subst_globals_in_address(tree->left, changed);
+        else
+            tree->left = subst_globals(tree->left, changed);
+    }
     tree->right = subst_globals(tree->right, changed);
     return tree;
+}
+
+// Of a place only what its address is computed from is read.
+void subst_globals_in_address(NODE* place, bool* changed) {
+    while (place->op == STDOT) place = place->left;
+    if (place->op == NAME) return;
+    place->left = subst_globals(place->left, changed);
+    place->right = subst_globals(place->right, changed);
 }
 
 } // namespace
@@ -120,10 +156,6 @@ struct COUNTS {
 
 bool is_automatic(const SYMTAB* sym) {
     return sym->level == 2 && (sym->sclass == SC_AUTO || sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2);
-}
-
-bool is_plain_scalar(const TYPE* t) {
-    return (t->is_int() || t->is_enum() || t->is_float() || t->is_pointer()) && !t->is_volatile() && !t->is_vector();
 }
 
 // The NAME that a write goes to, wholly or in part; null where it goes through a pointer.
@@ -239,7 +271,7 @@ bool SWEEP::is_propagable(SYMTAB* sym, const COUNTS& c) const {
     if (expr_is_propagable(value, c.uses)) return true;
     // What `restrict` says holds for this variable alone.
     if (sym->type->qual_kind(false) & QUAL_RESTRICT) return false;
-    while (value->op == PCONV && value->left->type->is_pointer()) value = value->left;
+    while ((value->op == PCONV || value->op == ISP2CHAR) && value->left->type->is_pointer()) value = value->left;
     return is_lasting_name(value);
 }
 
@@ -334,7 +366,7 @@ bool SWEEP::rewrite_statement(LIST* s) {
     tree_changed = false;
     const bool was_decided = is_decided(s->first);
     s->first = subst(s->first);
-    if (opt_level() >= 2 && file_symbols_are_known) s->first = subst_globals(s->first, &tree_changed);
+    if (opt_level() >= 2) s->first = subst_globals(s->first, &tree_changed);
     if (!tree_changed) return false;
     changed = true;
     if (!tree_is_ASM_comment(s->first)) s->first = peel_for_effect(simp_tree(s->first, nullptr));
@@ -365,7 +397,7 @@ bool SWEEP::run() {
     count();
     judge();
     if (!pass_disable_fcprevsymtab) f->scalar_syms = revsymtab(f->scalar_syms);
-    if (!f->snmap->empty() || (opt_level() >= 2 && file_symbols_are_known)) rewrite();
+    if (!f->snmap->empty() || opt_level() >= 2) rewrite();
     f->snmap->clear();
     return changed;
 }

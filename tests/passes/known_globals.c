@@ -1,0 +1,78 @@
+// Reads of constants at file scope are their values: scalars, elements of tables, members. What has no place known
+// before the run, may be replaced by the linker, or is watched, is read.
+// RUN: --opt_level=2
+#include <zrun.h>
+
+static const int limit = 12, table[4] = {3, 5, 7, 11};
+static const float scale = 0.5f;
+static const long wide[3] = {100000, 2, 3};
+const unsigned char text[] = "AZ";
+static const volatile int port = 3;
+static int variable = 4, changing[2] = {1, 2};
+int* where = &variable;
+static const int grid[2][3] = {{1, 2, 3}, {4, 5, 6}};
+extern const int elsewhere;
+
+// FUNCTION: scalars
+// HAS: return n + 12
+int scalars(int n) { return n + limit; }
+
+// FUNCTION: elements
+// HAS: return n + 18
+int elements(int n) { return n + table[1] + table[2] + grid[1][2]; }
+
+// FUNCTION: wider
+// HAS: return 100003
+long wider(void) { return wide[0] + wide[2]; }
+
+// FUNCTION: letters
+// HAS: return 155
+int letters(void) { return text[0] + text[1] + text[2]; }
+
+// FUNCTION: through_pointer
+// HAS: return 12
+int through_pointer(void) {
+    const int* p = table;
+    return p[1] + p[2];
+}
+
+// FUNCTION: real
+// HAS: return x * 0x1p-1
+float real(float x) { return x * scale; }
+
+// FUNCTION: unknown_place
+// HAS: /return .*_table/
+int unknown_place(int i) { return table[i]; }
+
+// FUNCTION: beyond
+// HAS: /return .*_grid/
+int beyond(int n) { return n ? 0 : *((const int*)grid + 7); }
+
+// FUNCTION: watched
+// HAS: return _port
+int watched(void) { return port; }
+
+// FUNCTION: written
+// HAS: /return .*_changing.*_variable/
+int written(void) { return variable + changing[1]; }
+
+// FUNCTION: address
+// HAS: /return .*&_limit/
+const int* address(void) { return &limit; }
+
+int main(void) {
+    *where = 9;
+    changing[1] = 3;
+    put_i16(scalars(1));
+    put_i16(elements(2));
+    put_i32(wider());
+    put_i16(letters());
+    put_i16(through_pointer());
+    put_f32(real(3));
+    put_i16(unknown_place(3));
+    put_i16(beyond(1));
+    put_i16(watched());
+    put_i16(written());
+    put_i16(*address());
+    return 0;
+}

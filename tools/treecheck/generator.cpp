@@ -217,7 +217,29 @@ NODE* GENERATOR::effect(TYPE* type, int depth) {
 }
 
 // ---- Operators
+// A choice by the value of the thing chosen: the lesser, the greater, a clamp, or one that changes the thing in
+// between.
+NODE* GENERATOR::choice_by_value(TYPE* type, int depth) {
+    NODE* x = leaf(type);
+    NODE* limit = random.one_in(2) ? constant(type) : operand(type, depth);
+    int op = EQ + static_cast<int>(random.pick(6));
+    if (op >= LE && type->is_unsigned()) op += ULE - LE;
+    if (type->is_float()) op = FEQ + static_cast<int>(random.pick(14));
+    auto arm = [&] {
+        NODE* t = copy_tree(random.pick(3) ? x : limit);
+        if (random.one_in(4)) t = maketree(UMINUS, t, nullptr, type);
+        if (random.one_in(3)) t = binary(PLUS, t, constant(type), type);
+        if (options.effects && x->op == NAME && random.one_in(5))
+            t = binary(COMMAOP, binary(ASG, copy_tree(x), constant(type), type), t, type);
+        return t;
+    };
+    NODE* arms = binary(COLON, arm(), arm(), type);
+    return binary(QUEST, binary(op, x, limit, tp->int_t), arms, type);
+}
+
 NODE* GENERATOR::choice(TYPE* type, int depth) {
+    if (!type->is_pointer() && (type->is_float() || computes(type)) && random.one_in(2))
+        return choice_by_value(type, depth);
     NODE* a = operand(type, depth);
     NODE* b = random.one_in(4) ? copy_tree(a) : operand(type, depth);
     return binary(QUEST, condition(depth - 1), binary(COLON, a, b, type), type);

@@ -13,10 +13,15 @@ static bool symbol_is_boolean(const SYMTAB* sym) {
                    (sym->cpp_type && sym->cpp_type->is_bool()));
 }
 
-static bool operand_of_ABS_returns_1_or_0(const NODE* t) {
+// Nodes that the question looks at, so that asking at every node of a tree stays linear.
+constexpr int MOST_NODES = 24;
+
+static bool returns_1_or_0(const NODE* t, int* budget);
+
+static bool operand_of_ABS_returns_1_or_0(const NODE* t, int* budget) {
     // |x - 1| of a truth value is its opposite.
     bool is_decrement = t->op == PLUS && t->right->op == ICON && t->right->u.lval == INT65(-1) && t->type->is_signed();
-    return returns_1_or_0(is_decrement ? t->left : t);
+    return returns_1_or_0(is_decrement ? t->left : t, budget);
 }
 
 static bool known_bits_are_one_bit(const NODE* t) {
@@ -26,7 +31,8 @@ static bool known_bits_are_one_bit(const NODE* t) {
     return (above & ~type_ops_seams.find_known_zeros(t, type)).is_zero();
 }
 
-bool returns_1_or_0(const NODE* t) {
+static bool returns_1_or_0(const NODE* t, int* budget) {
+    if (--*budget < 0) return false;
     if (!is_integral(element_type(t->type))) return false;
     switch (t->op) {
     case NAME:
@@ -34,25 +40,25 @@ bool returns_1_or_0(const NODE* t) {
         break;
     case ICON: return !t->u.lval.is_negative() && t->u.lval < INT65(2);
     case MINUS:
-        if (t->left->op == ICON && t->left->u.lval == INT65(1) && returns_1_or_0(t->right)) return true;
+        if (t->left->op == ICON && t->left->u.lval == INT65(1) && returns_1_or_0(t->right, budget)) return true;
         break;
     case MULT:
     case ORB:
     case XORB:
     case COLON:
-        if (returns_1_or_0(t->left) && returns_1_or_0(t->right)) return true;
+        if (returns_1_or_0(t->left, budget) && returns_1_or_0(t->right, budget)) return true;
         break;
     case ANDB:
-        if (returns_1_or_0(t->left) || returns_1_or_0(t->right)) return true;
+        if (returns_1_or_0(t->left, budget) || returns_1_or_0(t->right, budget)) return true;
         break;
     case UMULT:
         if (t->type->is_bool()) return true;
         if (!t->right && t->left->op == UAND && equiv_mtypes(t->left->left->type, t->type))
-            return returns_1_or_0(t->left->left);
+            return returns_1_or_0(t->left->left, budget);
         break;
-    case QUEST: return returns_1_or_0(t->right);
+    case QUEST: return returns_1_or_0(t->right, budget);
     case ABS:
-        if (operand_of_ABS_returns_1_or_0(t->left)) return true;
+        if (operand_of_ABS_returns_1_or_0(t->left, budget)) return true;
         break;
     case STDOT:
     case STREF: {
@@ -72,7 +78,7 @@ bool returns_1_or_0(const NODE* t) {
     case SSA_DEF:
     case SSA_MU:
     case SSA_CHI:
-        if (returns_1_or_0(t->left)) return true;
+        if (returns_1_or_0(t->left, budget)) return true;
         break;
     case ICALL:
     case MCALL:
@@ -83,6 +89,11 @@ bool returns_1_or_0(const NODE* t) {
         if (boolean_result[t->op] && !t->type->is_vector()) return true;
     }
     return known_bits_are_one_bit(t);
+}
+
+bool returns_1_or_0(const NODE* t) {
+    int budget = MOST_NODES;
+    return returns_1_or_0(t, &budget);
 }
 
 bool value_fits_in_type(const NODE* tree, TYPE* t, struct LOOP* loop) {

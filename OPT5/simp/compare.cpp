@@ -82,7 +82,8 @@ bool bits_differ(const NODE* a, const NODE* b) {
 NODE* decide(NODE* t, struct LOOP* loop) {
     if (same_value(t->left, t->right)) return decided(t, holds_for_equals(t->op));
     if (const int o = outcome(t->op, bounds_of(t->left, loop), bounds_of(t->right, loop))) return decided(t, o > 0);
-    if (is_equality(t) && bits_differ(t->left, t->right)) return decided(t, t->op == NEQ);
+    if (is_equality(t) && (bits_differ(t->left, t->right) || tree_values_are_not_equal(t->left, t->right, loop)))
+        return decided(t, t->op == NEQ);
     return nullptr;
 }
 

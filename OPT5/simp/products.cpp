@@ -290,7 +290,7 @@ NODE* divide_sum(NODE* t, struct LOOP* loop) {
 
 NODE* simp_DIV_by_ICON(NODE* t, struct LOOP* loop) {
     if (!is_icon(t->right) || is_icon(t->right, INT65(0))) return nullptr;
-    for (RULE rule : {divide_by_power_of_2, join_divisors, divide_product, divide_sum})
+    for (RULE rule : {join_divisors, divide_product, divide_sum, divide_by_power_of_2})
         if (NODE* r = rule(t, loop)) return r;
     return nullptr;
 }

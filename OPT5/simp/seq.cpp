@@ -76,6 +76,10 @@ private:
         const bool keeps = side_effects[t->op] == 2 || t->op == PPRAGMA || t->op == ASM || tree_is_arg_prolog(t);
         if (!is_simplified) t = simp_tree(t, nullptr);
         is_simplified = false;
+        if (t && !keeps && is_small_constant_STASG(t)) {
+            statement(convert_STASG_to_asgs(t));
+            return;
+        }
         if (t && !keeps) {
             if (t->op == COMMAOP || t->op == QUEST || t->op == ANDAND || t->op == OROR) {
                 statement(t);
@@ -152,6 +156,11 @@ private:
 
     void condition(NODE* c, LBL* if_true, LBL* if_false) { condition(c, ref(if_true), ref(if_false)); }
 
+    static bool is_opposite(const NODE* c) {
+        return c->op == EQ && c->right->op == ICON && c->right->u.lval.is_zero() && c->left->type->is_scalar() &&
+               !c->left->type->is_float() && !c->left->type->is_complex() && !c->left->type->is_pointer();
+    }
+
     // Tests `c` and goes to one of two places; consumes all three.
     void condition(NODE* c, NODE* if_true, NODE* if_false) {
         switch (c->op) {
@@ -184,6 +193,13 @@ private:
         default: break;
         }
         c = simp_for_control(simp_tree(c, nullptr), nullptr);
+        if (is_opposite(c)) { // x == 0: x with the targets exchanged
+            NODE* inner = c->left;
+            erase_node(c->right);
+            erase_node(c);
+            condition(inner, if_false, if_true);
+            return;
+        }
         if (c->op == ANDAND || c->op == OROR || c->op == COMMAOP || c->op == EXCLAIM) {
             condition(c, if_true, if_false);
             return;
@@ -234,6 +250,16 @@ void dispatch_behind(NODE* t, LIST** out, PSN* psn) {
 } // namespace
 
 void sequence_tree(NODE* tree, LIST** list, PSN* psn, bool simplified) { SEQUENCER(list, psn, simplified).statement(tree); }
+
+NODE* promote_tree(NODE* tree, LIST** list, PSN* psn) {
+    while (tree->op == COMMAOP) {
+        NODE *before = tree->left, *value = tree->right;
+        erase_node(tree);
+        sequence_tree(before, list, psn);
+        tree = value;
+    }
+    return tree;
+}
 
 void seq_trees(NODE* (*prepare)(NODE*)) {
     FUNINFO* f = currfuninfo;

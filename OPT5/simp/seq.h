@@ -13,6 +13,16 @@ void seq_trees(NODE* (*prepare)(NODE*) = nullptr);
 // says that the tree has been through the simplifier as it stands.
 void sequence_tree(NODE* tree, LIST** list, struct PSN* psn, bool simplified = false);
 
+// Sequences what comes before the value of `tree` behind the statements of `*list`; the rest of the tree.
+NODE* promote_tree(NODE* tree, LIST** list, struct PSN* psn);
+
+// ---- Structures
+NODE* apply_UAND_to_struct(NODE* tree); // the address of a structure's value; consumes the tree
+// Whether a statement copies a constant object of a small structure of plain members, and its assignments one by one.
+bool is_small_constant_STASG(const NODE* tree);
+NODE* convert_STASG_to_asgs(NODE* tree); // a chain of COMMAOPs
+
+// ---- Exceptions
 // The statement that stands for the dispatch of an exception behind a call: a SWITCH on a magic call whose cases lead
 // to the handlers. It keeps the handlers reachable while the function is optimized and is not written out.
 NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through);

@@ -1,0 +1,275 @@
+// Rules of the simplifier that are not expressions of C: effects, built-in functions, vectors and complex values,
+// memory, structures, and the operations that other passes call.
+
+#include "../ir/evaluator.h"
+
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
+
+using namespace test_trees;
+
+namespace {
+
+class Families : public Trees {
+protected:
+    static void SetUpTestSuite() {
+        start();
+        static bool done = false;
+        if (done) return;
+        done = true;
+        init_target();
+        init_BIF_descriptors();
+        instantiate_generic_BIF("_itod", find_BIF_descriptor("SORREL_ITOD"));
+        instantiate_generic_BIF("_itoll", find_BIF_descriptor("SORREL_ITOLL"));
+        instantiate_generic_BIF("_hi", find_BIF_descriptor("SORREL_HI"));
+        instantiate_generic_BIF("_lo", find_BIF_descriptor("SORREL_LO"));
+        instantiate_generic_BIF("_amem4", find_BIF_descriptor("SORREL_AMEM4"));
+        instantiate_generic_BIF("_mem4", find_BIF_descriptor("SORREL_MEM4"));
+        instantiate_generic_BIF("__builtin_expect_", find_BIF_descriptor("__builtin_expect"));
+        init_simplifier();
+    }
+
+    SYMTAB *xs = symbol("x", tp->int_t), *ys = symbol("y", tp->int_t), *zs = symbol("z", tp->int_t),
+           *us = symbol("u", tp->uint_t), *ls = symbol("l", tp->long_t), *ds = symbol("d", tp->double_t),
+           *ps = symbol("p", tp->mk_ptr(tp->int_t));
+    NODE* x() { return name(xs); }
+    NODE* y() { return name(ys); }
+    NODE* u() { return name(us); }
+    static NODE* args(NODE* a, NODE* b) { return maketree(COMMA, a, b, tp->int_t); }
+    static NODE* f() { return call("f", tp->int_t); }
+
+    struct ROW {
+        NODE* tree;
+        const char* expected;
+    };
+    template <std::size_t N>
+    static void check(const ROW (&rows)[N]) {
+        for (const ROW& row : rows) {
+            const std::string before = show(row.tree);
+            NODE* t = simp_tree(row.tree, nullptr);
+            EXPECT_EQ(show(t), row.expected) << before;
+            erase_tree(t);
+        }
+    }
+};
+
+TEST_F(Families, EffectsComeBeforeWhatUsesThem) {
+    auto comma = [](NODE* a, NODE* b) { return bin(COMMAOP, a, b, b->type); };
+    auto set = [](NODE* a, NODE* b) { return bin(ASG, a, b, a->type); };
+    NODE* p = name(ps);
+    const ROW rows[] = {
+        {bin(MULT, comma(f(), x()), comma(f(), y())), "f(), x * (f(), y)"}, // f could change x
+        {bin(MULT, icon(7), comma(f(), y())), "f(), y * 7"},
+        {bin(PLUS, x(), comma(set(y(), icon(1)), icon(2))), "y = 1, x + 2"},
+        {bin(PLUS, x(), comma(set(x(), icon(1)), icon(2))), "x + (x = 1, 2)"},
+        {bin(PLUS, set(x(), icon(4)), icon(1)), "x = 4, 5"},
+        {bin(PLUS, f(), set(x(), icon(4))), "f() + (x = 4)"},
+        {set(x(), comma(f(), y())), "f(), x = y"},
+        {set(deref(p), comma(f(), y())), "*p = (f(), y)"}, // f could change p
+        {deref(comma(f(), name(ps))), "f(), *p"},
+        {bin(ANDAND, x(), comma(f(), y())), "x && (f(), y)"},
+        {bin(QUEST, comma(f(), x()), bin(COLON, y(), icon(0)), tp->int_t), "f(), x ? y : 0"},
+        {comma(x(), y()), "y"},
+        {comma(comma(f(), x()), y()), "f(), y"},
+        {comma(bin(PLUS, f(), x()), y()), "f(), y"},
+    };
+    check(rows);
+}
+
+TEST_F(Families, BuiltInFunctions) {
+    auto ternary = [](NODE* c, NODE* a, NODE* b) {
+        return make_strict_ternary_ICALL(bin(QUEST, c, bin(COLON, a, b, a->type), a->type));
+    };
+    auto less = [&](NODE* a, NODE* b) { return bin(LT, a, b, tp->int_t); };
+    auto unary_call = [](const char* f, NODE* a, TYPE* type) { return mk_ICALL(f, a, type); };
+    auto itod = [&] { return mk_ICALL("_itod", args(u(), un(SCONV, x(), tp->uint_t)), tp->double_t); };
+    auto word = [&](const char* f) { return un(SCONV, unary_call(f, name(ds), tp->uint_t), tp->uint_t); };
+    const ROW rows[] = {
+        {ternary(less(x(), y()), bin(MINUS, y(), x()), bin(MINUS, x(), y())), "ABS(y - x)"},
+        {ternary(less(x(), y()), bin(MINUS, x(), y()), bin(MINUS, y(), x())), "quest$colon(x < y, x - y, y - x)"},
+        {ternary(less(x(), y()), un(SCONV, x(), tp->long_t), un(SCONV, y(), tp->long_t)),
+         "(long)quest$colon(x < y, x, y)"},
+        {ternary(icon(1), x(), y()), "x"},
+        {ternary(less(x(), y()), x(), x()), "x"},
+        {unary_call("DONOTCSE", unary_call("DONOTCSE", x(), tp->int_t), tp->int_t), "DONOTCSE(x)"},
+        {mk_ICALL("__builtin_expect_", args(icon(3, tp->long_t), icon(1, tp->long_t)), tp->long_t), "3L"},
+        {mk_ICALL("__builtin_expect_", args(name(ls), icon(1, tp->long_t)), tp->long_t), "__builtin_expect_(l, 1L)"},
+        {mk_ICALL("_itod", args(icon(0, tp->uint_t), icon(0, tp->uint_t)), tp->double_t), "0.0"},
+        {mk_ICALL("_itoll", args(icon(0, tp->uint_t), icon(0, tp->uint_t)), tp->llong_t), "0LL"},
+        {mk_ICALL("_itod", args(word("_hi"), word("_lo")), tp->double_t), "d"},
+        {mk_ICALL("_itod", args(word("_lo"), word("_hi")), tp->double_t), "_itod(_lo(d), _hi(d))"},
+        {unary_call("_hi", itod(), tp->uint_t), "u"},
+        {unary_call("_lo", itod(), tp->uint_t), "(unsigned int)x"},
+        {unary_call("_hi", mk_ICALL("_itod", args(u(), un(SCONV, f(), tp->uint_t)), tp->double_t), tp->uint_t),
+         "_hi(_itod(u, (unsigned int)f()))"},
+        {unary_call("_hi", fcon("0.0"), tp->uint_t), "0u"},
+        {unary_call("_mem4", name(ps), tp->mk_ptr(tp->uint_t)), "NONALIGN((unsigned int *)p)"},
+    };
+    check(rows);
+    NODE* t = simp_tree(unary_call("_amem4", name(ps), tp->mk_ptr(tp->ulong_t)), nullptr);
+    EXPECT_EQ(show(t), "NASSERT((long)p % 2L == 0L), (unsigned long *)p");
+    erase_tree(t);
+}
+
+TEST_F(Families, VectorsAndComplexValues) {
+    TYPE* pair = tp->mk_vector(tp->int_t, false, 2);
+    SYMTAB* vs = symbol("v", pair);
+    auto lane = [&](int i) { return maketree(VFIELD, name(vs), icon(i), tp->int_t); };
+    auto pack = [&](NODE* list) { return maketree(VPACK, list, nullptr, pair); };
+    TYPE* complex = tp->mk_complex(tp->float_t);
+    SYMTAB *hs = symbol("h", tp->float_t), *gs = symbol("g", tp->float_t), *cs = symbol("c", complex);
+    auto make = [&] { return maketree(COMPLEX, name(hs), name(gs), complex); };
+    const ROW rows[] = {
+        {pack(args(lane(0), lane(1))), "v"},
+        {pack(args(lane(1), lane(0))), "VPACK(VFIELD(v, 1), VFIELD(v, 0))"},
+        {pack(args(icon(3), icon(3))), "VPACKM(3)"},
+        {pack(args(icon(3), icon(4))), "VPACK(3, 4)"},
+        {pack(x()), "VPACKM(x)"},
+        {maketree(VFIELD, pack(args(x(), y())), icon(1), tp->int_t), "y"},
+        {maketree(VFIELD, pack(args(f(), y())), icon(1), tp->int_t), "VFIELD(VPACK(f(), y), 1)"},
+        {maketree(VFIELD, maketree(VPACKM, x(), nullptr, pair), icon(1), tp->int_t), "x"},
+        {maketree(REAL, make(), nullptr, tp->float_t), "h"},
+        {maketree(IMAG, make(), nullptr, tp->float_t), "g"},
+        {maketree(COMPLEX, maketree(REAL, name(cs), nullptr, tp->float_t),
+                  maketree(IMAG, name(cs), nullptr, tp->float_t), complex),
+         "c"},
+    };
+    check(rows);
+}
+
+TEST_F(Families, AssignmentsThatWriteMembersAndMemory) {
+    SYMTAB* ss = symbol("s", sample_struct());
+    auto bits = [&] { return member(name(ss), sample_member(1)); };
+    auto memcpy_of = [&](NODE* to, NODE* from, long n) {
+        return maketree(MEMCPY, args(args(to, from), icon(n)), nullptr, to->type);
+    };
+    SYMTAB *flag = symbol("b", tp->bool_t), *global = symbol("g", tp->int_t, 0, SC_EXTDEF);
+    auto set = [](NODE* a, NODE* b) { return bin(ASG, a, b, a->type); };
+    const ROW rows[] = {
+        {set(bits(), icon(13, tp->uint_t)), "s.bits = 5u"},
+        {set(bits(), bin(ANDB, u(), icon(15, tp->uint_t))), "s.bits = u"},
+        {set(bits(), bin(ANDB, u(), icon(3, tp->uint_t))), "s.bits = u & 3u"},
+        {set(name(flag), un(SCONV, x(), tp->bool_t)), "b = (bool)x"}, // a truth value, not the low bits
+        {set(name(global), set(x(), y())), "g = x = y"},
+        {set(x(), set(name(global), y())), "g = x = y"},
+        {set(x(), set(x(), y())), "x = y"},
+        {set(x(), bin(PLUS, bin(PLUS, y(), x()), u(), tp->int_t)), "x = y + x + u"}, // of two types
+        {set(x(), bin(PLUS, bin(MINUS, y(), name(zs)), x())), "x += y - z"},
+        {set(x(), bin(MINUS, bin(MINUS, x(), y()), name(zs))), "x -= y + z"},
+        {set(x(), bin(MINUS, y(), x())), "x = y - x"},
+        {set(x(), bin(ORB, bin(ORB, y(), x()), name(zs))), "x |= y | z"},
+        {set(x(), bin(PLUS, y(), icon(1))), "x = y + 1"},
+        {set(x(), bin(PLUS, x(), icon(1))), "x = x + 1"}, // a counter
+        {set(name(global), bin(PLUS, name(global), icon(1))), "g += 1"},
+        {memcpy_of(name(ps), name(ps), 8), "p"},
+        {bin(STASG, name(ss), name(ss), sample_struct()), "s"},
+    };
+    check(rows);
+}
+
+TEST_F(Families, TermsAreBroughtToTheTop) {
+    NODE* target = x();
+    struct CASE {
+        NODE* tree;
+        const char* expected;
+    } cases[] = {
+        {bin(PLUS, y(), x()), "x + y"},
+        {bin(PLUS, bin(PLUS, y(), x()), name(zs)), "x + (y + z)"},
+        {bin(MINUS, bin(MINUS, x(), y()), name(zs)), "x - (y + z)"},
+        {bin(PLUS, bin(MINUS, x(), y()), name(zs)), "x - (y - z)"},
+        {bin(PLUS, y(), bin(MINUS, x(), name(zs))), "x + (y - z)"},
+        {bin(MULT, y(), bin(MULT, name(zs), x())), "x * (y * z)"},
+        {bin(MINUS, y(), x()), "y - x"},
+        {bin(PLUS, f(), x()), "f() + x"},
+    };
+    for (CASE& c : cases) {
+        const std::string before = show(c.tree);
+        c.tree = bubble_term_to_top(c.tree, target);
+        EXPECT_EQ(show(c.tree), c.expected) << before;
+        erase_tree(c.tree);
+    }
+    erase_tree(target);
+}
+
+TEST_F(Families, ChainsAreReassociated) {
+    auto sum = [](NODE* a, NODE* b) { return bin(PLUS, a, b); };
+    struct CASE {
+        NODE* tree;
+        const char* expected;
+    } cases[] = {
+        {sum(sum(sum(x(), y()), icon(3)), sum(x(), icon(4))), "x * 2 + y + 7"},
+        {bin(MINUS, sum(sum(x(), y()), name(zs)), x()), "y + z"},
+        {bin(XORB, bin(XORB, bin(XORB, x(), y()), name(zs)), y()), "x ^ z"},
+        {bin(ANDB, bin(ANDB, x(), y()), x()), "x & y"},
+        {bin(MULT, bin(MULT, x(), icon(3)), bin(MULT, y(), icon(5))), "x * y * 15"},
+        {sum(sum(x(), y()), name(zs)), "x + y + z"},
+        {sum(sum(f(), icon(1)), icon(2)), "f() + 1 + 2"},
+    };
+    for (CASE& c : cases) {
+        const std::string before = show(c.tree);
+        c.tree = simp_assoc(c.tree, nullptr);
+        EXPECT_EQ(show(c.tree), c.expected) << before;
+        erase_tree(c.tree);
+    }
+}
+
+TEST_F(Families, OnlyTheBitsThatMatterAreComputed) {
+    struct CASE {
+        NODE* tree;
+        long mask;
+        const char* expected;
+    } cases[] = {
+        {bin(ANDB, x(), icon(255)), 15, "x"},
+        {bin(ANDB, x(), icon(7)), 15, "x & 7"},
+        {bin(ORB, x(), icon(16)), 15, "x"},
+        {bin(PLUS, bin(ANDB, x(), icon(255)), bin(ORB, y(), icon(256))), 15, "x + y"},
+        {bin(SRL, bin(ANDB, u(), icon(0xFF0, tp->uint_t)), icon(4), tp->uint_t), 15, "u >> 4"},
+        {bin(SRL, bin(ORB, x(), icon(-32768)), icon(4), tp->int_t), 0xF000, "(x | -32768) >> 4"}, // copies of the sign
+        {bin(DIV, bin(ANDB, x(), icon(255)), icon(3)), 1, "(x & 255) / 3"},
+    };
+    for (CASE& c : cases) {
+        const std::string before = show(c.tree);
+        c.tree = prop_mask_into_subtree(c.tree, INT65(c.mask));
+        EXPECT_EQ(show(c.tree), c.expected) << before;
+        erase_tree(c.tree);
+    }
+}
+
+TEST_F(Families, AddressesAndCopiesOfStructures) {
+    SYMTAB *ss = symbol("s", sample_struct()), *sp = symbol("q", tp->mk_ptr(sample_struct()));
+    struct CASE {
+        NODE* tree;
+        const char* expected;
+    } cases[] = {
+        {name(ss), "&s"},
+        {deref(name(sp)), "q"},
+        {bin(COMMAOP, f(), name(ss), sample_struct()), "f(), &s"},
+        {bin(QUEST, x(), bin(COLON, name(ss), deref(name(sp)), sample_struct()), sample_struct()), "x ? &s : q"},
+    };
+    for (CASE& c : cases) {
+        const std::string before = show(c.tree);
+        c.tree = apply_UAND_to_struct(c.tree);
+        EXPECT_EQ(show(c.tree), c.expected) << before;
+        erase_tree(c.tree);
+    }
+
+    TYPE* two = tp->mk_struct("two", 32, 16, false);
+    fkMDATA* a = new fkMDATA("a", tp->int_t, 0, 0, 0, false, false, false, false);
+    a->next = new fkMDATA("b", tp->int_t, 0, 16, 0, false, false, false, false);
+    tp->set_mdata(two, a);
+    tp->type_frozen(two);
+    SYMTAB *to = symbol("t", two), *from = symbol("k", tp->mk_qual(two, QUAL_CONST), 0, SC_STATIC),
+           *other = symbol("o", two);
+    NODE* copy = bin(STASG, name(to), name(from), two);
+    ASSERT_TRUE(is_small_constant_STASG(copy));
+    copy = convert_STASG_to_asgs(copy);
+    EXPECT_EQ(show(copy), "t.a = k.a, t.b = k.b");
+    erase_tree(copy);
+    copy = bin(STASG, name(to), name(other), two);
+    EXPECT_FALSE(is_small_constant_STASG(copy));
+    erase_tree(copy);
+}
+
+} // namespace

@@ -68,12 +68,10 @@ register_option pass_disable_lir_vn_simp("disable:lir_vn_simp");
 register_option pass_disable_loop_coalescing("disable:loop_coalescing");
 register_option pass_disable_newinline("disable:newinline");
 register_option pass_disable_simple_rotation("disable:simple_rotation");
-register_option pass_disable_superblock_opt("disable:superblock_opt");
 register_option pass_disable_switch_hoisting("disable:switch_hoisting");
 register_option pass_disable_tail_duplication("disable:tail_duplication");
 register_option pass_disable_target_expansion("disable:target_expansion");
 register_option pass_disable_threads("disable:threads");
-register_option pass_disable_trace_straighten("disable:trace_straighten");
 register_option pass_disable_vecvec("disable:vecvec");
 register_option pass_disable_vn("disable:vn");
 

@@ -15,6 +15,7 @@
 #include "OPT5/mvp/mvp.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
+#include "OPT5/scalar/profile.h"
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
@@ -96,7 +97,7 @@ void OPT_CLIENT::cl_label(uint32_t label) {
     LIST*& statements = currfuninfo->statements;
     if (statements && statements->first->op == BRANCH && statements->first->left &&
         statements->first->left->op == LABELREF && statements->first->left->u.lval == INT65(label)) {
-        initialize_the_profiling_state(0);
+        initialize_the_profiling_state(statements->first);
         LIST* cell = statements;
         statements = cell->rest;
         erase_tree(cell->first);
@@ -161,7 +162,7 @@ void OPT_CLIENT::cl_begin_func(I_SYMTAB* isym, PSN* psn) {
     open_scopes.push_back({psn, nullptr});
     if (sym->cqual & CQ_INLINE && sym->sclass == SC_STATIC && TEST_FLAG(f, FUN_cannot_suppress)) unsuppress_inline_function(f);
     dump_function_header();
-    initialize_the_profiling_state(0);
+    initialize_the_profiling_state(nullptr);
 }
 
 void OPT_CLIENT::cl_end_args(PSN* psn) {

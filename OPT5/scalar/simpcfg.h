@@ -28,10 +28,8 @@ void straighten_traces_in_cfg();
 void straighten_cond_paths();
 void optimize_superblocks_in_cfg();
 
-// Profile data as frequencies and probabilities of blocks and edges.
+// Tells the loops' annotations how often they go round, from the profile.
 void add_loop_annotation_from_profile();
-void initialize_CFG_profiling_annotation(int keep, int exact);
-void initialize_the_profiling_state(int status);
 
 // ---- Used between the files of the control-flow simplifier. Each returns whether it changed the graph, and leaves
 // unreachable blocks to `rebuildcfg`.

@@ -1,0 +1,192 @@
+// Superblocks of the graph as it is: chains of blocks of which each but the first is entered from the one before alone.
+//
+// What one block knows of its variables holds in the next, so constants and copies that are assigned in the chain are
+// put in the place of later reads. It takes no data flow: an assignment to a variable ends what is known of it and of
+// its copies. Only variables take part that nothing but their NAME can change.
+
+#include "OPT5/scalar/sblk.h"
+#include "OPT5/scalar/simpcfg.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
+
+#include <memory>
+#include <unordered_map>
+#include <unordered_set>
+
+register_option pass_disable_superblock_opt("disable:superblock_opt");
+
+namespace {
+
+bool is_private(const SYMTAB* sym) {
+    if (!sym || sym->level == 0 || sym->is_aliased() || sym->type->is_volatile() || !sym->type->is_scalar())
+        return false;
+    if (sym->sclass != SC_AUTO && sym->sclass != SC_REGISTER && sym->sclass != SC_REGISTER2) return false;
+    return !currfuninfo->has_eh() || !sym_appears_in_EHT(sym);
+}
+
+bool is_private_name(const NODE* t) { return t->op == NAME && is_private(t->u.sym) && !t->type->is_volatile(); }
+
+// A change of a value behind its back: the root of the statement is looked at apart.
+void collect_written(NODE* t, std::unordered_set<const SYMTAB*>& written) {
+    for_each_node(t, [&](const NODE* n) {
+        if (side_effects[n->op] == 1 && n->left && n->left->op == NAME) written.insert(n->left->u.sym);
+    });
+}
+
+class PROPAGATION {
+public:
+    ~PROPAGATION() {
+        for (auto& [sym, value] : values) erase_tree(value);
+    }
+
+    bool block(BBLK* bb) {
+        bool changed = false;
+        for (LIST* s = bb->statements; s; s = s->rest) changed |= statement(s);
+        return changed;
+    }
+
+private:
+    bool statement(LIST* s) {
+        NODE* t = s->first;
+        if (t->op == PPRAGMA || t->op == ASM || t->op == BRANCH || t->op == PCOMMA || tree_is_arg_prolog(t) ||
+            tree_is_EH_SWITCH(t)) {
+            forget_written(t);
+            return false;
+        }
+        // What an assignment below the root writes is neither the old nor the new value throughout the statement.
+        std::unordered_set<const SYMTAB*> written;
+        if (t->left) collect_written(t->left, written);
+        if (t->right) collect_written(t->right, written);
+        for (const SYMTAB* sym : written) forget(sym);
+        bool changed = false;
+        if (!values.empty()) {
+            s->first = t = read(t, &changed);
+            if (changed) s->first = t = simp_tree(t, nullptr);
+        }
+        forget_written(t);
+        if (t->op == ASG && written.empty()) learn(t);
+        return changed;
+    }
+
+    NODE* read(NODE* t, bool* changed) {
+        if (!t) return nullptr;
+        switch (t->op) {
+        case NAME: return value_of(t, changed);
+        case UAND:
+        case ARGREF:
+        case LABELREF:
+        case FIELD: return t;
+        case IF:
+        case SWITCH: t->left = t->left->op == ENDLOOP ? t->left : read(t->left, changed); return t;
+        case RETURN: t->right = read(t->right, changed); return t;
+        case STDOT: // an object's member keeps its object
+            if (t->left->op != NAME) t->left = read(t->left, changed);
+            return t;
+        default: break;
+        }
+        if (!(side_effects[t->op] == 1 && t->left->op == NAME)) t->left = read(t->left, changed);
+        t->right = read(t->right, changed);
+        return t;
+    }
+
+    NODE* value_of(NODE* name, bool* changed) {
+        auto it = values.find(name->u.sym);
+        if (it == values.end()) return name;
+        NODE* value = copy_tree(it->second);
+        value->ls = name->ls;
+        NODE* fitted = coerce_to_type(name->type->stqs(), value);
+        erase_tree(name);
+        *changed = true;
+        return fitted;
+    }
+
+    void learn(const NODE* asg) {
+        if (!is_private_name(asg->left)) return;
+        SYMTAB* sym = asg->left->u.sym;
+        const NODE* value = asg->right;
+        TYPE* type = sym->type->stqs();
+        if (value->op == ICON && type->is_int() && value->type->is_int())
+            values[sym] = mk_integer_constant(value->u.lval, type);
+        else if (value->op == FCON && type->is_float() && equiv_mtypes(value->type, type))
+            values[sym] = copy_tree(value);
+        else if (is_private_name(value) && value->u.sym != sym && equiv_mtypes(value->u.sym->type->stqs(), type)) {
+            values[sym] = copy_tree(value);
+            copies[value->u.sym].push_back(sym);
+        }
+    }
+
+    void forget_written(NODE* t) {
+        std::unordered_set<const SYMTAB*> written;
+        collect_written(t, written);
+        for (const SYMTAB* sym : written) forget(sym);
+    }
+
+    void drop(const SYMTAB* sym) {
+        auto it = values.find(sym);
+        if (it == values.end()) return;
+        erase_tree(it->second);
+        values.erase(it);
+    }
+
+    // The variable itself, and what is a copy of it.
+    void forget(const SYMTAB* sym) {
+        drop(sym);
+        auto it = copies.find(sym);
+        if (it == copies.end()) return;
+        for (const SYMTAB* copy : it->second) {
+            auto value = values.find(copy);
+            if (value != values.end() && value->second->op == NAME && value->second->u.sym == sym) drop(copy);
+        }
+        copies.erase(it);
+    }
+
+    std::unordered_map<const SYMTAB*, NODE*> values; // looked up, never walked but to free
+    std::unordered_map<const SYMTAB*, std::vector<const SYMTAB*>> copies;
+};
+
+BBLK* only_predecessor(const BBLK* bb) {
+    const EDGE* e = bb->predecessors;
+    return e && !e->rest ? e->first : nullptr;
+}
+
+// Each block goes to the chain of its only predecessor if that ends there; the graph's order sees the predecessor
+// first.
+std::vector<std::unique_ptr<SBLK>> form_superblocks() {
+    std::vector<std::unique_ptr<SBLK>> superblocks;
+    SBLK::next_number = 1;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->trace = nullptr;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        const BBLK* before = only_predecessor(bb);
+        auto* chain = before ? static_cast<SBLK*>(before->trace) : nullptr;
+        if (chain && chain->tail == before)
+            chain->add_basic_block(bb);
+        else
+            superblocks.push_back(std::make_unique<SBLK>(bb));
+    }
+    return superblocks;
+}
+
+} // namespace
+
+void optimize_superblocks_in_cfg() {
+    FUNINFO* f = currfuninfo;
+    if (!f || !f->bb_list || pass_disable_superblock_opt) return;
+    if (print_debug) debug_printf("\n\n\t\t\t------ ENTERING 'optimize_superblocks_in_cfg' ------\n");
+    init_aliasing_info(false);
+    bool changed = false;
+    const auto superblocks = form_superblocks();
+    for (const auto& superblock : superblocks) {
+        if (print_debug && fdebug && superblock->contents.size() > 1) superblock->print(false, fdebug);
+        PROPAGATION propagation;
+        for (BBLK* bb : superblock->contents)
+            if (!bb->is_in_LIR_form()) changed |= propagation.block(bb);
+    }
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) bb->trace = nullptr;
+    if (changed) simpcfg(false, false);
+}

@@ -11,6 +11,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
 
 #include <vector>
@@ -274,13 +275,19 @@ NODE* simp_assertion(NODE* t, struct LOOP* loop) {
 struct PLACE {
     NODE** link;
     bool operands_are_done;
+    bool is_lvalue; // written, or its address is taken
 };
+
+bool has_lvalue(const NODE* t) { return opcode_is_ASG(t->op) || t->op == UAND || t->op == ARGREF; }
+
+// The place that a conditional chooses is none of the values there.
+bool is_chosen_place(const NODE* t) { return t->op == UMULT && is_strict_ternary_ICALL(t->left); }
 
 } // namespace
 
 NODE* simp_tree(NODE* tree, struct LOOP* loop) {
     if (!tree) return tree;
-    std::vector<PLACE> open{{&tree, false}};
+    std::vector<PLACE> open{{&tree, false, false}};
     while (!open.empty()) {
         PLACE& place = open.back();
         NODE* t = *place.link;
@@ -288,13 +295,13 @@ NODE* simp_tree(NODE* tree, struct LOOP* loop) {
             *place.link = simp_assertion(t, loop);
             open.pop_back();
         } else if (place.operands_are_done || (!t->left && !t->right)) {
-            *place.link = simp_node(t, loop);
+            if (!place.is_lvalue || !is_chosen_place(t)) *place.link = simp_node(t, loop);
             open.pop_back();
         } else {
             if (t == tree && t->op == ASSERT) return simp_assertion(t, loop);
             place.operands_are_done = true;
-            if (t->right) open.push_back({&t->right, false});
-            if (t->left) open.push_back({&t->left, false});
+            if (t->right) open.push_back({&t->right, false, false});
+            if (t->left) open.push_back({&t->left, false, has_lvalue(t)});
         }
     }
     return tree;

@@ -408,6 +408,20 @@ BITS EVALUATOR::call(const NODE* t) {
     return wrap(r & 1 ? r : r >> 8 & 7, form_of(t->type));
 }
 
+// A conditional that computes both arms, and marks that give their operand.
+BITS EVALUATOR::intrinsic(const NODE* t) {
+    const FORM own = form_of(t->type);
+    const std::string name = t->u.name;
+    if (name == "quest$colon") {
+        const NODE *tested = t->left->left->left, *a = t->left->left->right, *b = t->left->right;
+        const bool holds = truth(tested);
+        const BITS x = convert(eval(a), form_of(a->type), own), y = convert(eval(b), form_of(b->type), own);
+        return holds ? x : y;
+    }
+    if (name == "DONOTCSE") return convert(eval(t->left), form_of(t->left->type), own);
+    return fail();
+}
+
 void EVALUATOR::copy_record(const NODE* t) {
     const PLACE from = place(t->right), to = place(t->left);
     const unsigned units = static_cast<unsigned>(t->left->type->size / 16);
@@ -473,6 +487,7 @@ BITS EVALUATOR::eval(const NODE* t) {
         return convert(write(p, stored), p.form, own);
     }
     case STASG: copy_record(t); return 0;
+    case ICALL: return intrinsic(t);
     case CALL:
     case UCALL: return call(t);
     case PLUSPLUS: return compound(t, PLUS, true);

@@ -86,6 +86,7 @@ private:
     bool compare(const NODE* t);
     BITS compound(const NODE* t, int op, bool before);
     BITS call(const NODE* t);
+    BITS intrinsic(const NODE* t);
     void arguments(const NODE* list, BITS* hash);
     void copy_record(const NODE* t);
 

@@ -205,6 +205,10 @@ NODE* GENERATOR::call(SYMTAB* function, int depth) {
 // Something with a side effect, as a value.
 NODE* GENERATOR::effect(TYPE* type, int depth) {
     NODE* t;
+    if (random.one_in(16)) {
+        NODE* copy = binary(STASG, mk_NAME(w.record), mk_NAME(w.other_record), w.record_type);
+        return binary(COMMAOP, copy, leaf(type), type);
+    }
     switch (random.pick(depth > 0 ? 6 : 2)) {
     case 0: t = call(w.functions[random.pick(2)], depth); break;
     case 1: t = mk_NAME(random.of(w.volatiles)); break;
@@ -242,6 +246,10 @@ NODE* GENERATOR::choice(TYPE* type, int depth) {
         return choice_by_value(type, depth);
     NODE* a = operand(type, depth);
     NODE* b = random.one_in(4) ? copy_tree(a) : operand(type, depth);
+    if (random.one_in(6)) { // both arms are computed
+        NODE* args = binary(COMMA, binary(COMMA, truth(depth - 1), a, tp->int_t), b, tp->int_t);
+        return mk_ICALL("quest$colon", args, type);
+    }
     return binary(QUEST, condition(depth - 1), binary(COLON, a, b, type), type);
 }
 
@@ -373,6 +381,7 @@ NODE* GENERATOR::pointer(TYPE* type, int depth) {
 }
 
 NODE* GENERATOR::value(TYPE* type, int depth) {
+    if (depth > 0 && random.one_in(60)) return mk_ICALL("DONOTCSE", value(type, depth - 1), type);
     if (depth <= 0 || random.one_in(10)) return leaf(type);
     if (is_loose && !type->is_pointer() && random.one_in(2)) {
         NODE* t = loose(depth);

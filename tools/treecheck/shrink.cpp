@@ -21,6 +21,7 @@ bool left_is_value(const NODE* t) {
     case ARGREF:
     case CALL:
     case UCALL: return false;
+    case ICALL: return t->left->op != COMMA;
     }
     return !opcode_is_ASG(t->op);
 }

@@ -6,6 +6,7 @@
 #include "OPT5/ir/opcodes.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
 #include "UTIL/safemem.h"
 
 #include <string>
@@ -21,6 +22,7 @@ void start_packages() {
     TYPE_PKG::init_type_pkg(tp);
     init_opcode_tables();
     init_types();
+    init_BIF_descriptors();
 }
 
 SYMTAB* make_symbol(const std::string& name, TYPE* type, int level, int sclass) {

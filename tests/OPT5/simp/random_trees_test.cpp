@@ -5,6 +5,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
 
 #include <gtest/gtest.h>
 
@@ -93,6 +94,22 @@ TEST(RandomTrees, CastsOfBoundaries) {
                     expect_kept(maketree(SCONV, maketree(SCONV, constant(v, x->type), nullptr, middle), nullptr, to));
                 expect_kept(maketree(SCONV, maketree(SCONV, mk_NAME(x), nullptr, middle), nullptr, to));
             }
+}
+
+// A conditional that computes both arms chooses a place as well as a value.
+TEST(RandomTrees, ChosenPlacesStayPlaces) {
+    const WORLD& w = world();
+    TYPE* pointer = tp->mk_ptr(tp->int_t);
+    auto place = [&] {
+        auto address = [&](SYMTAB* s) { return maketree(UAND, mk_NAME(s), nullptr, pointer); };
+        NODE* arms = maketree(COLON, address(w.addressed[0]), address(w.addressed[0]), pointer);
+        NODE* test = maketree(NEQ, mk_NAME(w.integers[0]), constant(3, tp->int_t), tp->int_t);
+        return maketree(UMULT, make_strict_ternary_ICALL(maketree(QUEST, test, arms, pointer)), nullptr, tp->int_t);
+    };
+    expect_kept(maketree(ASG, place(), constant(5, tp->int_t), tp->int_t));
+    expect_kept(maketree(PLUSASG, place(), constant(5, tp->int_t), tp->int_t));
+    expect_kept(maketree(UAND, place(), nullptr, pointer));
+    expect_kept(place());
 }
 
 // The checker itself: what is wrong is seen.

@@ -84,6 +84,26 @@ int order_of(int op, TYPE* type) {
     }
 }
 
+// Whether the arm `value` is what the compare's side `bound` is. Of integers the neighbour across the border serves as
+// well: `y >= 8 ? 7 : y` is the smaller of y and 7, as `y > 7 ? 7 : y` is.
+bool is_bound(const NODE* value, const NODE* bound, int op, bool on_the_right) {
+    if (trees_are_congruent(value, bound, false)) return true;
+    if (value->op != ICON || bound->op != ICON || !on_the_right || !equiv_mtypes(value->type, bound->type))
+        return false;
+    const INT65 v = value->u.lval, b = bound->u.lval;
+    switch (op) {
+    case LT:
+    case GE:
+    case ULT:
+    case UGE: return v == b - INT65(1);
+    case LE:
+    case GT:
+    case ULE:
+    case UGT: return v == b + INT65(1);
+    default: return false;
+    }
+}
+
 // The call of the target's built-in for `c ? a : b` where c compares a with b, or null. Of a floating pair the second
 // argument is the one that must be smaller (larger) to win, so that a NaN and zeros of both signs choose as before.
 NODE* make_minmax(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
@@ -96,8 +116,8 @@ NODE* make_minmax(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
     }
     const int less = order_of(op, type);
     if (less < 0) return nullptr;
-    const bool straight = trees_are_congruent(a, c->left, false) && trees_are_congruent(b, c->right, false);
-    const bool crossed = trees_are_congruent(a, c->right, false) && trees_are_congruent(b, c->left, false);
+    const bool straight = is_bound(a, c->left, op, false) && is_bound(b, c->right, op, true);
+    const bool crossed = is_bound(a, c->right, op, true) && is_bound(b, c->left, op, false);
     if (!straight && !crossed) return nullptr;
     const bool maximum = (less == 1) == crossed;
     const char* generic = minmax_name(type, maximum);

@@ -7,6 +7,7 @@
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
+#include <vector>
 
 namespace {
 
@@ -102,6 +103,84 @@ private:
     BBLK *A = nullptr, *B = nullptr, *C = nullptr, *D = nullptr, *E, *F = nullptr;
 };
 
+// ---- A loop whose test still stands on top
+
+constexpr int MAX_TEST_NODES = 12;
+
+// The test that a jump back leads to, if it is all of its block and cheap enough to stand twice.
+const NODE* test_on_top(const BBLK* bb) {
+    const NODE* control = bb->branch();
+    if (!control || control->op != BRANCH) return nullptr;
+    const BBLK* head = control->left->lbl->bblock;
+    const LIST* test = head->statements;
+    if (head->dfn > bb->dfn || bb->dflink == head || !test || test->rest || test->first->op != IF) return nullptr;
+    if (test->first->left->op == ENDLOOP || count_nodes_in_tree(test->first->left) > MAX_TEST_NODES) return nullptr;
+    return test->first;
+}
+
+// Its copy takes the jump's place: one conditional branch a round instead of a test and a jump.
+void close_loops_by_tests() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        if (bb->is_in_LIR_form()) continue;
+        const NODE* test = test_on_top(bb);
+        if (!test) continue;
+        LIST* last = bb->last_statement();
+        disconnect(bb, last->first->left->lbl->bblock);
+        erase_tree(last->first);
+        last->first = copy_tree(test);
+        fixup_edge_lists(bb, last->first);
+    }
+}
+
+// ---- What a loop leaves to stands behind it
+
+constexpr int MAX_RUN = 32; // blocks
+
+bool falls_through(const BBLK* bb) { return bb->dflink && edge_memberp(bb->dflink, bb->successors); }
+
+// The blocks from `first` that control falls along; null if that holds `without` or the entry, or is long. `first`
+// itself must not be fallen into.
+BBLK* end_of_run(BBLK* first, const BBLK* without) {
+    if (first == currfuninfo->bb_list || falls_through(first->rdflink)) return nullptr;
+    BBLK* last = first;
+    for (int n = 0; last != without; last = last->dflink) {
+        if (!falls_through(last)) return last;
+        if (++n == MAX_RUN) break;
+    }
+    return nullptr;
+}
+
+void move_run(BBLK* first, BBLK* last, BBLK* behind) {
+    BBLK* const entry = currfuninfo->bb_list;
+    BBLK *before = first->rdflink, *after = last->dflink, *next = behind->dflink;
+    before->dflink = after;
+    (after ? after : entry)->rdflink = before;
+    behind->dflink = first;
+    first->rdflink = behind;
+    last->dflink = next;
+    (next ? next : entry)->rdflink = last;
+}
+
+// A test neither way of which is the next block costs a jump on one of them. Where the way out of a loop is fallen into
+// from nowhere, it moves here, and the way that stays in the loop is one conditional branch.
+void put_exits_behind_tests() {
+    std::vector<BBLK*> tests;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        const NODE* control = bb->branch();
+        if (control && control->op == IF && control->left->op != ENDLOOP && !falls_through(bb) &&
+            edge_length(bb->successors) == 2)
+            tests.push_back(bb);
+    }
+    for (BBLK* bb : tests) {
+        BBLK *exit = bb->successors->first, *stay = bb->successors->rest->first;
+        // Of two ways back the nearer stays in the inner loop.
+        if (stay->dfn > bb->dfn || (exit->dfn <= bb->dfn && exit->dfn > stay->dfn)) std::swap(exit, stay);
+        if (falls_through(bb) || stay->dfn > bb->dfn) continue; // moved meanwhile, or no loop
+        BBLK* last = end_of_run(exit, bb);
+        if (last && last != bb) move_run(exit, last, bb);
+    }
+}
+
 } // namespace
 
 void rotate_loops() {
@@ -117,4 +196,10 @@ void rotate_loops() {
         changed = true;
     }
     if (changed) renumber_bblocks();
+    constexpr int SIZE_MATTERS_MOST = 1;
+    if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
+        close_loops_by_tests();
+        put_exits_behind_tests();
+        renumber_bblocks();
+    }
 }

@@ -51,6 +51,23 @@ int32_t largest(const int32_t *p, int n) {
     return m;
 }
 
+// FUNCTION: bounded
+// COUNT 0: if (
+// HAS: /__min\(.*7/
+// HAS: /__max\(.*-1/
+int bounded(int x, int y) {
+    if (x >= 8) x = 7;
+    if (y < 0) y = -1;
+    return x + y;
+}
+
+// FUNCTION: not_the_bound
+// COUNT 0: __min
+int not_the_bound(int x) {
+    if (x >= 8) x = 6;
+    return x;
+}
+
 // FUNCTION: clipped
 // COUNT 0: if (
 // HAS: /__fmax\(/
@@ -101,6 +118,7 @@ int main(void) {
     put_i16(falsehood(8) * 10 + falsehood(9));
     put_i16(smaller(-5, 4) * 10 + smaller(7, 6));
     put_i32(largest(list, 5));
+    for (int i = 6; i < 10; i++) put_i16(bounded(i, i - 8) * 100 + not_the_bound(i));
     put_f32(clipped(-2.0F) + clipped(3.0F));
     put_f32(clipped(zero / zero));
     put_f32(1.0F / clipped(-zero));

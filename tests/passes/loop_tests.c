@@ -1,0 +1,20 @@
+// A loop is closed by one conditional branch: its test moves to its end, or stands there a second time.
+// RUN: --opt_level=2
+#include <zrun.h>
+
+int g[8];
+
+// FUNCTION: nested
+// COUNT 0: /^goto L(?!2$)/
+int nested(int n) {
+    int sum = 0, i, j;
+    for (i = 0; i < n; i++)
+        for (j = 0; j < i; j++) sum += g[j];
+    return sum;
+}
+
+int main(void) {
+    for (int i = 0; i < 8; i++) g[i] = i * i;
+    for (int n = -1; n < 7; n += 2) put_i16(nested(n));
+    return 0;
+}

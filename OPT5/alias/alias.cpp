@@ -10,7 +10,6 @@
 #include "OPT5/target/bif.h"
 
 #include <cstring>
-#include <initializer_list>
 
 LOOP_ASSERTION_HOOKS loop_assertion_hooks;
 bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b) = nullptr;
@@ -84,6 +83,46 @@ bool are_told_apart_by_records(const NODE* a, const NODE* b) {
 
 } // namespace
 
+// ---- restrict
+
+namespace {
+
+// Its block is the function's, so that there is one life of it; an inner block begins anew each time round a loop.
+bool lives_once(const PTR* p) { return p->scope->depth <= 2 && p->scope->function == currfuninfo; }
+
+// The record of an lvalue's pointer if that is `restrict` and keeps the value that it was declared with.
+const PTR* restricted_record(const NODE* lvalue, bool at_any_time) {
+    const PTR* p = record_of(lvalue);
+    if (!p || !(p->flags & PTR_IS_RESTRICTED) || p->member) return nullptr;
+    if (p->flags & (PTR_IS_REASSIGNED | PTR_IS_FILE_LEVEL | PTR_IS_BOTTOM)) return nullptr;
+    if (!p->scope || may_be_reached_by_pointers(p->symbol)) return nullptr;
+    return !at_any_time || lives_once(p) ? p : nullptr;
+}
+
+// In the scope of `p` what it points to is accessed through it and what is derived from it alone.
+bool is_kept_from(const PTR* p, const NODE* through_p, const NODE* other) {
+    if (!through_p->ls || !other->ls || !p->scope->encloses(through_p->ls) || !p->scope->encloses(other->ls))
+        return false;
+    const PTR* q = record_of(other);
+    if (q) return !(q->root->flags & PTR_IS_BOTTOM) && q->root != p->root;
+    // An object by its name: the pointer of a local scope may have been replaced by it in places.
+    return p->root->symbol->level == 1 && !(p->root->flags & PTR_IS_BOTTOM) && address_form(other).object;
+}
+
+bool are_kept_apart(const NODE* a, const NODE* b, bool at_any_time) {
+    if (a == b || !groups_are_known()) return false;
+    const PTR* p = restricted_record(a, at_any_time);
+    if (p && is_kept_from(p, a, b)) return true;
+    p = restricted_record(b, at_any_time);
+    return p && is_kept_from(p, b, a);
+}
+
+} // namespace
+
+bool unaliased_by_scope(const NODE* a, const NODE* b) { return are_kept_apart(a, b, false); }
+
+// ---- Pairs
+
 bool object_symbols_may_alias(const SYMTAB* a, const SYMTAB* b) {
     if (!a || !b || a == b) return true;
     if ((a->lives_in_others && b->hosts_others) || (b->lives_in_others && a->hosts_others)) return true;
@@ -117,7 +156,7 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     if (object_a && is_out_of_reach(object_a, b, y)) return false;
     if (object_b && is_out_of_reach(object_b, a, x)) return false;
     if (accesses_are_disjoint(x, y, loop)) return false;
-    if (unaliased_by_scope(a, b) || are_told_apart_by_records(a, b)) return false;
+    if (are_kept_apart(a, b, loop != nullptr) || are_told_apart_by_records(a, b)) return false;
     if (UMULT_PT_targets_may_overlap && a->ptenv && b->ptenv && !UMULT_PT_targets_may_overlap(a, b)) return false;
     const NODE *p = pointer_of(a), *q = pointer_of(b);
     if (loop && p && q && pointers_are_antialiased(p, q, loop, loop)) return false;
@@ -129,38 +168,6 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     if (loop && p && q && build_the_umults_alias_free_by_predication_lists(a, b, loop)) return false;
     if (unsure) *unsure = true;
     return true;
-}
-
-// ---- restrict
-
-namespace {
-
-// The record of an lvalue's pointer if that is `restrict` and keeps the value that it was declared with.
-const PTR* restricted_record(const NODE* lvalue) {
-    const PTR* p = record_of(lvalue);
-    if (!p || !(p->flags & PTR_IS_RESTRICTED) || p->member) return nullptr;
-    if (p->flags & (PTR_IS_REASSIGNED | PTR_IS_FILE_LEVEL | PTR_IS_BOTTOM)) return nullptr;
-    return p->scope && !may_be_reached_by_pointers(p->symbol) ? p : nullptr;
-}
-
-// In the scope of `p` what it points to is accessed through it and what is derived from it alone.
-bool is_kept_from(const PTR* p, const NODE* through_p, const NODE* other) {
-    if (!through_p->ls || !other->ls || !p->scope->encloses(through_p->ls) || !p->scope->encloses(other->ls))
-        return false;
-    const PTR* q = record_of(other);
-    if (q) return !(q->root->flags & PTR_IS_BOTTOM) && q->root != p->root;
-    // An object by its name: the pointer of a local scope may have been replaced by it in places.
-    return p->root->symbol->level == 1 && !(p->root->flags & PTR_IS_BOTTOM) && address_form(other).object;
-}
-
-} // namespace
-
-bool unaliased_by_scope(const NODE* a, const NODE* b) {
-    if (a == b || !groups_are_known()) return false;
-    const PTR* p = restricted_record(a);
-    if (p && is_kept_from(p, a, b)) return true;
-    p = restricted_record(b);
-    return p && is_kept_from(p, b, a);
 }
 
 // ---- Assertions of loops

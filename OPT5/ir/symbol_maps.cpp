@@ -190,7 +190,7 @@ void SNMAP::remove(const SYMTAB* sym) {
 
 void SNMAP::clear() {
     for (auto& entry : map) erase_tree(entry.second);
-    map.clear();
+    std::unordered_map<const SYMTAB*, NODE*>().swap(map);
 }
 
 void SNMAP::print(FILE* out) const {

@@ -23,7 +23,7 @@ public:
     bool is_bound(const SYMTAB* sym) const { return map.count(sym) != 0; }
     bool is_bottom(const SYMTAB* sym) const; // bound, and to anything
     void remove(const SYMTAB* sym) { map.erase(sym); }
-    void clear() { map.clear(); }
+    void clear() { std::unordered_map<const SYMTAB*, SPINFO>().swap(map); } // the memory too
     void print(FILE* out) const; // in order of the symbols' indexes
 
     // Of a bound symbol; at the bottom no object, 0 and false.

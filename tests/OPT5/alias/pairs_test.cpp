@@ -170,6 +170,22 @@ TEST_F(Pairs, VolatileAccessesKeepTheirOrder) {
     expect_apart(name(a), name(plain));
 }
 
+// A pointer of a loop's body is another one in the next turn.
+TEST_F(Pairs, RestrictOfAnInnerBlock) {
+    TYPE* sole = tp->mk_qual(ptr(tp->int_t), QUAL_RESTRICT);
+    SYMTAB *outer = parameter("o", sole), *x = parameter("x", ptr(tp->int_t)), *y = parameter("y", ptr(tp->int_t));
+    LS::open(nullptr, currfunc, 0);
+    SYMTAB* inner = local("p", sole);
+    set(inner, sum(name(x), icon(1)));
+    analyze();
+    NODE *p = keep(deref(name(inner))), *q = keep(deref(name(y))), *o = keep(deref(name(outer)));
+    auto* loop = reinterpret_cast<struct LOOP*>(&p);
+    EXPECT_FALSE(lvalues_may_be_aliased(p, q));
+    EXPECT_TRUE(lvalues_may_be_aliased(p, q, loop));
+    EXPECT_FALSE(lvalues_may_be_aliased(o, q, loop));
+    LS::close(nullptr, currfunc, 0);
+}
+
 TEST_F(Pairs, Restrict) {
     TYPE* sole = tp->mk_qual(ptr(tp->int_t), QUAL_RESTRICT);
     SYMTAB *p = parameter("p", sole), *q = parameter("q", ptr(tp->int_t)), *g = global("g", tp->int_t);

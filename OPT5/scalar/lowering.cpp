@@ -5,7 +5,6 @@
 int GO_FOR_INSTRUMENTATION = 0;
 
 void expand_bitfields() {}
-void explode_auto_struct_vars() {}
 void convert_sti_to_cinit() {}
 void build_stack_sharing_type() {}
 void subst_csu_returning_temp_for_local_var() {}

@@ -52,6 +52,12 @@ NODE* absolute_difference(NODE* call, struct LOOP* loop) {
     return made(ABS, difference, nullptr, type, loop);
 }
 
+// Evaluates part of itself only under a condition: what stands there may be undefined otherwise.
+bool is_conditional_within(const NODE* t) {
+    return tree_contains_matching_node(
+        t, [](const NODE* n) { return n->op == QUEST || n->op == ANDAND || n->op == OROR; });
+}
+
 NODE* simp_strict_ternary_ICALL(NODE* t, struct LOOP* loop) {
     if (!is_strict_ternary_ICALL(t)) return t;
     if (NODE* cast = cast_outward(t)) {
@@ -61,8 +67,9 @@ NODE* simp_strict_ternary_ICALL(NODE* t, struct LOOP* loop) {
     if (is_integer(t->type))
         if (NODE* r = absolute_difference(t, loop)) return r;
     if (!is_pure(t) || !t->type->is_scalar() || t->type->is_complex()) return t;
+    const bool has_lazy_parts = is_conditional_within(argument(t, 1)) || is_conditional_within(argument(t, 2));
     NODE* r = simp_node(undo_strict_ternary_ICALL(t, false), loop);
-    return r->op == QUEST && r->right->op == COLON ? make_strict_ternary_ICALL(r) : r;
+    return r->op == QUEST && r->right->op == COLON && !has_lazy_parts ? make_strict_ternary_ICALL(r) : r;
 }
 
 // The arm that a known test takes.

@@ -112,6 +112,18 @@ TEST(RandomTrees, ChosenPlacesStayPlaces) {
     expect_kept(place());
 }
 
+// What only one arm of an inner conditional may compute is not computed for both.
+TEST(RandomTrees, GuardedDivisionsStayGuarded) {
+    const WORLD& w = world();
+    auto x = [&] { return mk_NAME(w.integers[0]); };
+    auto arms = [](NODE* a, NODE* b) { return maketree(COLON, a, b, tp->int_t); };
+    auto guarded = [&] {
+        return maketree(QUEST, x(), arms(maketree(DIV, constant(100, tp->int_t), x(), tp->int_t), x()), tp->int_t);
+    };
+    NODE* test = maketree(NEQ, mk_NAME(w.integers[1]), constant(3, tp->int_t), tp->int_t);
+    expect_kept(make_strict_ternary_ICALL(maketree(QUEST, test, arms(guarded(), guarded()), tp->int_t)));
+}
+
 // The checker itself: what is wrong is seen.
 TEST(RandomTrees, FaultsAreFound) {
     const WORLD& w = world();

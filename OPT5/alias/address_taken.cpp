@@ -117,20 +117,44 @@ bool may_be_reached_by_pointers(const SYMTAB* sym) {
     return !marks_are_known() || sym->is_aliased();
 }
 
-void init_aliasing_info(bool groups) {
+namespace {
+
+// The written part of a vector or complex variable, or null.
+SYMTAB* written_in_part(const NODE* t) {
+    const NODE* to = t->left;
+    if (!writes_left_operand(t->op) || !to || to->op == NAME) return nullptr;
+    return get_vector_or_complex_symbol(to);
+}
+
+// One walk for all: a tree is looked at while it is in the cache. `writes` may be null.
+void set_marks(POINTER_WRITES* writes) {
     FUNINFO* f = currfuninfo;
     for_each_symbol([](SYMTAB* s) { s->set_is_aliased(false); });
     for (SYMTAB* s : f->dropped_syms) s->set_is_aliased(false);
     for (SYMTAB* s = global_symbols; s; s = s->next) s->set_is_aliased(file_symbol_may_be_aliased(s));
-    for_each_tree(f, [](const NODE* tree) { mark_addressed(tree, false); });
-    mark_aliased_vector_and_complex_symbols(false, true);
+    for_each_tree(f, [writes](const NODE* tree) {
+        mark_addressed(tree, false);
+        for_each_subtree(tree, [writes](const NODE* t) {
+            if (SYMTAB* sym = written_in_part(t)) sym->set_is_aliased(true);
+            if (writes) writes->collect(t);
+        });
+    });
     marked_function = f;
+    forget_groups();
+    f->spmap->clear();
+}
+
+} // namespace
+
+void init_alias_marks() { set_marks(nullptr); }
+
+void init_aliasing_info(bool groups) {
+    FUNINFO* f = currfuninfo;
+    POINTER_WRITES writes;
+    set_marks(&writes);
     // From here on what depends on the marks.
-    if (groups && f->ls_root && f->bottom_ptr)
-        LS::build_PTR_equivalence_groups();
-    else
-        forget_groups();
-    find_pointees();
+    if (groups && f->ls_root && f->bottom_ptr) build_groups(writes);
+    find_pointees(writes);
 }
 
 void reset_alias_info() {
@@ -149,9 +173,7 @@ SYMTAB* get_vector_or_complex_symbol(const NODE* t) {
 void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased) {
     for_each_tree(currfuninfo, [=](const NODE* tree) {
         for_each_subtree(tree, [=](const NODE* t) {
-            const NODE* to = t->left;
-            if (!writes_left_operand(t->op) || !to || to->op == NAME) return;
-            SYMTAB* sym = get_vector_or_complex_symbol(to);
+            SYMTAB* sym = written_in_part(t);
             if (!sym) return;
             sym->set_is_aliased(aliased);
             if (clear_bitnum) sym->set_bitnum(-1);

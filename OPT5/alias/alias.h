@@ -23,6 +23,8 @@ struct fkMDATA;
 // Sets `is_aliased` of every symbol of the current function and of the globals: true for an object that something other
 // than its own NAME may reach. `groups`: the equivalence groups of pointers are built as well, if the scopes are known.
 void init_aliasing_info(bool groups);
+// The marks alone, for a pass that asks for no more than `is_aliased`: of pointers nothing is known afterwards.
+void init_alias_marks();
 // Marks the vector and complex variables that are accessed by parts or as another type. `clear_bitnum` also takes them
 // out of the candidates that are numbered by `bitnum`; `aliased` is the mark that they get.
 void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased);

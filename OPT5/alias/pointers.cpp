@@ -72,29 +72,31 @@ bool is_null_constant(const NODE* t) {
     return t->op == ICON && t->u.lval.is_zero();
 }
 
-// One value that a pointer variable is given; null: one that is not known.
-struct DEFINITION {
-    SYMTAB* sym;
-    const NODE* value;
-};
+} // namespace
 
-// The definitions of the pointer variables of the function, those that step a pointer along its object left out.
-std::vector<DEFINITION> pointer_definitions(const FUNINFO* f) {
-    std::vector<DEFINITION> found;
-    for_each_tree(f, [&](const NODE* tree) {
-        for_each_subtree(tree, [&](const NODE* t) {
-            if (!writes_left_operand(t->op) || !t->left) return;
-            const NODE* to = t->left;
-            while (to->op >= SSA_USE && to->op <= SSA_CHI) to = to->left;
-            if (to->op != NAME || !to->u.sym || !to->u.sym->type->is_pointer()) return;
-            if (t->op == ASG)
-                found.push_back({to->u.sym, t->right});
-            else if (t->op != PLUSASG && t->op != MINUSASG && t->op != PLUSPLUS && t->op != MINMIN)
-                found.push_back({to->u.sym, nullptr});
-        });
-    });
-    return found;
+void POINTER_WRITES::collect(const NODE* t) {
+    if (!writes_left_operand(t->op) || !t->left) return;
+    const NODE* to = t->left;
+    while (to->op >= SSA_USE && to->op <= SSA_CHI) to = to->left;
+    if (to->op != NAME || !to->u.sym || !to->u.sym->type->is_pointer()) return;
+    if (t->op == ASG) {
+        definitions.push_back({to->u.sym, t->right});
+        return;
+    }
+    if (t->left == to) stepped.insert(to->u.sym);
+    if (t->op != PLUSASG && t->op != MINUSASG && t->op != PLUSPLUS && t->op != MINMIN)
+        definitions.push_back({to->u.sym, nullptr});
 }
+
+POINTER_WRITES pointer_writes(const FUNINFO* f) {
+    POINTER_WRITES writes;
+    for_each_tree(f, [&](const NODE* tree) { for_each_subtree(tree, [&](const NODE* t) { writes.collect(t); }); });
+    return writes;
+}
+
+namespace {
+
+using DEFINITION = POINTER_WRITES::DEFINITION;
 
 bool is_tracked(const SYMTAB* sym) {
     return sym->level > 0 && sym->type->is_pointer() && !sym->type->is_volatile() && !sym->is_aliased() &&
@@ -203,15 +205,16 @@ void print_group(const PTR* p) {
 bool groups_are_known() { return grouped_function && grouped_function == currfuninfo; }
 void forget_groups() { grouped_function = nullptr; }
 
-void LS::build_PTR_equivalence_groups() {
+void LS::build_PTR_equivalence_groups() { build_groups(pointer_writes(currfuninfo)); }
+
+void build_groups(const POINTER_WRITES& writes) {
     FUNINFO* f = currfuninfo;
     grouped_function = f;
     OPT_ASSERT(f->bottom_ptr && f->ls_root);
     for (PTR* p = f->ptrs; p; p = p->next) p->flags &= ~PTR_IS_REASSIGNED;
     f->bottom_ptr->scope = f->ls_root;
-    const std::vector<DEFINITION> definitions = pointer_definitions(f);
-    mark_reassigned(definitions);
-    find_roots(f, definitions);
+    mark_reassigned(writes.definitions);
+    find_roots(f, writes.definitions);
     uint32_t number = 0;
     for (const PTR* p = f->ptrs; p; p = p->next) ++number;
     for (PTR* p = f->ptrs; p; p = p->next) p->number = --number; // the bottom, which was made first, has 0
@@ -253,28 +256,21 @@ bool bind(SPMAP& map, SYMTAB* sym, const std::vector<const NODE*>& values, bool 
 
 } // namespace
 
-void find_pointees() {
+void find_pointees(const POINTER_WRITES& writes) {
     FUNINFO* f = currfuninfo;
     f->spmap->clear();
     std::vector<SYMTAB*> waiting; // in order of their first definitions
     std::map<const SYMTAB*, std::vector<const NODE*>> values;
-    for (const DEFINITION& d : pointer_definitions(f)) {
+    for (const DEFINITION& d : writes.definitions) {
         if (!is_tracked(d.sym) || d.sym->level == 1) continue;
         auto& list = values[d.sym];
         if (list.empty()) waiting.push_back(d.sym);
         list.push_back(d.value);
     }
-    std::set<const SYMTAB*> is_stepped;
-    for_each_tree(f, [&](const NODE* tree) {
-        for_each_subtree(tree, [&](const NODE* t) {
-            if (t->op != ASG && writes_left_operand(t->op) && t->left && t->left->op == NAME)
-                is_stepped.insert(t->left->u.sym);
-        });
-    });
     for (bool changed = true; changed;) {
         changed = false;
         for (SYMTAB*& sym : waiting) {
-            if (!sym || !bind(*f->spmap, sym, values[sym], is_stepped.count(sym) != 0)) continue;
+            if (!sym || !bind(*f->spmap, sym, values[sym], writes.stepped.count(sym) != 0)) continue;
             sym = nullptr;
             changed = true;
         }

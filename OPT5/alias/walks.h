@@ -5,6 +5,9 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/trees.h"
 
+#include <unordered_set>
+#include <vector>
+
 // Every tree that the function holds: statements as read, statements of blocks, and clean-up code of its exceptions.
 template <class F>
 void for_each_tree(const FUNINFO* f, const F& visit) {
@@ -26,9 +29,24 @@ void for_each_subtree(const NODE* t, const F& visit) {
 
 // Operators that give their left operand a value.
 inline bool writes_left_operand(int op) {
-    return opcode_is_ASG(op) || op == LOOP || op == INITLOOP || op == ENDLOOP || op == SSA_DEF || op == SSA_CHI ||
-           op == SSA_PHI;
+    constexpr int WRITES_LEFT = 1;
+    return side_effects[op] == WRITES_LEFT || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
 }
 
+// How the pointer variables of a function get their values.
+struct POINTER_WRITES {
+    // One value that a variable is given; null: one that is not known.
+    struct DEFINITION {
+        SYMTAB* sym;
+        const NODE* value;
+    };
+    std::vector<DEFINITION> definitions; // those that step a pointer along its object left out
+    std::unordered_set<const SYMTAB*> stepped;
+
+    void collect(const NODE* t); // of one node
+};
+POINTER_WRITES pointer_writes(const FUNINFO* f);
+
+void build_groups(const POINTER_WRITES& writes);
 // What each pointer variable of the current function points into, in its SPMAP.
-void find_pointees();
+void find_pointees(const POINTER_WRITES& writes);

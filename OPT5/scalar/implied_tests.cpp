@@ -18,7 +18,7 @@
 namespace {
 
 constexpr int MAX_BLOCKS_BACK = 8;
-constexpr int MAX_STATEMENTS_BACK = 64;
+constexpr int MAX_STATEMENTS_BACK = 24;
 constexpr int MAX_NODES = 32; // of a condition: larger ones are seldom repeated and dear to compare
 
 // ---- What a condition reads
@@ -223,35 +223,6 @@ std::optional<bool> implied(const NODE* p, bool sense, const NODE* q) {
 
 // ---- The way back
 
-bool block_may_change(const BBLK* bb, const READS& reads, int* budget) {
-    for (const LIST* s = bb->statements; s && s->rest; s = s->rest) // the control statement is looked at apart
-        if (--*budget < 0 || statement_may_change(s->first, reads)) return true;
-    return false;
-}
-
-// What the way from `pred` to `bb` says of `q`, back along sole predecessors.
-std::optional<bool> outcome_on_edge(const BBLK* pred, const BBLK* bb, const NODE* q, const READS& reads) {
-    int budget = MAX_STATEMENTS_BACK;
-    for (int blocks = 0; blocks < MAX_BLOCKS_BACK; ++blocks) {
-        NODE* control = pred->branch();
-        if (!control || pred->is_in_LIR_form()) return std::nullopt;
-        if (control->op == IF && control->left->op != ENDLOOP) {
-            const BBLK* on_true = control->right->left->lbl->bblock;
-            const BBLK* on_false = control->right->right->lbl->bblock;
-            if (on_true != on_false && !tree_has_side_effects(control->left)) {
-                int outcome = pred_implies_pred(control->left, on_true == bb, q);
-                if (outcome >= 0) return outcome != 0;
-            }
-        } else if (control->op != BRANCH && control->op != SWITCH)
-            return std::nullopt;
-        if (statement_may_change(control->left, reads) || block_may_change(pred, reads, &budget)) return std::nullopt;
-        if (!pred->predecessors || pred->predecessors->rest) return std::nullopt;
-        bb = pred;
-        pred = pred->predecessors->first;
-    }
-    return std::nullopt;
-}
-
 // A loop's test is left where it is: a way around it would enter the loop in its middle.
 bool has_back_edge(const BBLK* bb) {
     for (const EDGE* e = bb->predecessors; e; e = e->rest)
@@ -259,46 +230,105 @@ bool has_back_edge(const BBLK* bb) {
     return false;
 }
 
-void lead_around(BBLK* pred, BBLK* bb, BBLK* target) {
-    subst_bb_for_bb_in_bb(target, bb, pred);
+void lead_around(BBLK* pred, BBLK* bb, LIST* control, BBLK* target) {
+    subst_bb_for_bb_in_stmts(target, bb, control);
     disconnect(pred, bb);
     connect(pred, target);
 }
 
-bool remove_redundant_test(BBLK* bb) {
-    LIST* last = bb->last_statement();
-    NODE* control = last->first;
-    if (control->op != IF || control->left->op == ENDLOOP || !bb->predecessors) return false;
-    NODE* q = control->left;
-    if (count_nodes_in_tree(q) > MAX_NODES || tree_has_side_effects(q)) return false;
-    const READS reads = reads_of(q);
-    if (!reads.supported) return false;
-    int budget = MAX_STATEMENTS_BACK;
-    if (block_may_change(bb, reads, &budget)) return false;
-    BBLK* targets[2] = {control->right->right->lbl->bblock, control->right->left->lbl->bblock};
-
-    std::vector<std::pair<BBLK*, bool>> known;
-    bool all = true;
-    int predecessors = 0;
-    for (const EDGE* e = bb->predecessors; e; e = e->rest) {
-        if (++predecessors > MAX_BLOCKS_BACK) return false;
-        auto outcome = outcome_on_edge(e->first, bb, q, reads);
-        if (!outcome) {
-            all = false;
-            continue;
-        }
-        known.emplace_back(e->first, *outcome);
-        all &= known.front().second == *outcome;
+// Conditions are compared first, since few agree; the statements between two that do are looked at then.
+class TEST_REMOVER {
+public:
+    bool run() {
+        controls.assign(static_cast<size_t>(currfuninfo->bb_count) + 1, nullptr);
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            if (!bb->is_in_LIR_form()) control_of(bb) = bb->last_statement();
+        bool changed = false;
+        for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
+            if (control_of(bb)) changed |= remove_test(bb);
+        return changed;
     }
-    if (known.empty()) return false;
-    if (all) {
-        make_branch(bb, last, targets[known.front().second]);
+
+private:
+    LIST*& control_of(const BBLK* bb) { return controls[static_cast<size_t>(bb->dfn)]; }
+
+    static bool is_test(const NODE* t) { return t->op == IF && t->left->op != ENDLOOP; }
+
+    // What the way from `pred` to `bb` says of `q`, back along sole predecessors, if nothing on the way changes it.
+    std::optional<bool> outcome_on_edge(const BBLK* pred, const BBLK* bb, const NODE* q) {
+        const BBLK* const start = pred;
+        for (int blocks = 0; blocks < MAX_BLOCKS_BACK; ++blocks) {
+            const LIST* control = control_of(pred);
+            if (!control) return std::nullopt;
+            const NODE* t = control->first;
+            if (is_test(t)) {
+                const BBLK *on_true = t->right->left->lbl->bblock, *on_false = t->right->right->lbl->bblock;
+                const int outcome = on_true == on_false ? -1 : pred_implies_pred(t->left, on_true == bb, q);
+                if (outcome >= 0) {
+                    if (tree_has_side_effects(t->left) || may_change_between(pred, start)) return std::nullopt;
+                    return outcome != 0;
+                }
+            } else if (t->op != BRANCH && t->op != SWITCH)
+                return std::nullopt;
+            if (!pred->predecessors || pred->predecessors->rest) return std::nullopt;
+            bb = pred;
+            pred = pred->predecessors->first;
+        }
+        return std::nullopt;
+    }
+
+    // The blocks behind `test`, down to `last`; each is the sole predecessor of the next.
+    bool may_change_between(const BBLK* test, const BBLK* last) {
+        int budget = MAX_STATEMENTS_BACK;
+        for (const BBLK* bb = last; bb != test; bb = bb->predecessors->first)
+            if (block_may_change(bb, &budget) || statement_may_change(control_of(bb)->first->left, reads)) return true;
+        return false;
+    }
+
+    bool block_may_change(const BBLK* bb, int* budget) {
+        for (const LIST* s = bb->statements; s && s->rest; s = s->rest)
+            if (--*budget < 0 || statement_may_change(s->first, reads)) return true;
+        return false;
+    }
+
+    bool remove_test(BBLK* bb) {
+        LIST* last = control_of(bb);
+        NODE* control = last->first;
+        if (!is_test(control) || !bb->predecessors) return false;
+        const NODE* q = control->left;
+        if (count_nodes_in_tree(q) > MAX_NODES || tree_has_side_effects(q)) return false;
+        reads = reads_of(control->left);
+        if (!reads.supported) return false;
+
+        std::vector<std::pair<BBLK*, bool>> known;
+        bool all = true;
+        int predecessors = 0;
+        for (const EDGE* e = bb->predecessors; e; e = e->rest) {
+            if (++predecessors > MAX_BLOCKS_BACK) return false;
+            auto outcome = outcome_on_edge(e->first, bb, q);
+            if (!outcome) {
+                all = false;
+                continue;
+            }
+            known.emplace_back(e->first, *outcome);
+            all &= known.front().second == *outcome;
+        }
+        int budget = MAX_STATEMENTS_BACK;
+        if (known.empty() || block_may_change(bb, &budget)) return false;
+        BBLK* targets[2] = {control->right->right->lbl->bblock, control->right->left->lbl->bblock};
+        if (all) {
+            make_branch(bb, last, targets[known.front().second]);
+            if (last->rest) control_of(bb) = last->rest;
+            return true;
+        }
+        if (last != bb->statements || has_back_edge(bb)) return false;
+        for (auto [pred, outcome] : known) lead_around(pred, bb, control_of(pred), targets[outcome]);
         return true;
     }
-    if (last != bb->statements || has_back_edge(bb)) return false;
-    for (auto [pred, outcome] : known) lead_around(pred, bb, targets[outcome]);
-    return true;
-}
+
+    std::vector<LIST*> controls; // by dfn
+    READS reads;                 // of the condition in work
+};
 
 } // namespace
 
@@ -307,10 +337,4 @@ int pred_implies_pred(const NODE* p, bool sense, const NODE* q) {
     return known ? *known : -1;
 }
 
-bool remove_redundant_tests() {
-    if (opt_level() < 2) return false;
-    bool changed = false;
-    for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
-        if (bb->statements && !bb->is_in_LIR_form()) changed |= remove_redundant_test(bb);
-    return changed;
-}
+bool remove_redundant_tests() { return opt_level() >= 2 && TEST_REMOVER().run(); }

@@ -160,8 +160,7 @@ void find_live_variables(int mode, bool with_lifetimes) {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'find_live_variables' --------\n");
     sym_split(f);
     split_statements();
-    init_aliasing_info(false);
-    mark_aliased_vector_and_complex_symbols(false, true);
+    init_alias_marks();
     number_candidates();
     if (f->lva_sym_count == 0) return;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) compute_use_and_def(bb, static_cast<uint32_t>(f->lva_sym_count));

@@ -255,6 +255,16 @@ LIST* insert_around(LIST** link, LIST* s, const PROMOTER& promoter) {
 
 } // namespace
 
+namespace {
+
+bool block_has_embedded(const BBLK* bb) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (!is_left_alone(s->first) && has_embedded(s->first)) return true;
+    return false;
+}
+
+} // namespace
+
 bool promote_embedded_assignments_in_bb(BBLK* bb) {
     bool changed = false;
     for (LIST** link = &bb->statements; *link;) {
@@ -276,8 +286,12 @@ bool promote_embedded_assignments_in_bb(BBLK* bb) {
 
 void promote_all_embedded_assignments() {
     if (!currfuninfo->bb_list) return;
+    std::vector<BBLK*> blocks;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (block_has_embedded(bb)) blocks.push_back(bb);
+    if (blocks.empty()) return;
     init_aliasing_info(false);
     bool changed = false;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) changed |= promote_embedded_assignments_in_bb(bb);
+    for (BBLK* bb : blocks) changed |= promote_embedded_assignments_in_bb(bb);
     if (changed) sym_split(currfuninfo);
 }

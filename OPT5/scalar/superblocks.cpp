@@ -178,7 +178,7 @@ void optimize_superblocks_in_cfg() {
     FUNINFO* f = currfuninfo;
     if (!f || !f->bb_list || pass_disable_superblock_opt) return;
     if (print_debug) debug_printf("\n\n\t\t\t------ ENTERING 'optimize_superblocks_in_cfg' ------\n");
-    init_aliasing_info(false);
+    init_alias_marks();
     bool changed = false;
     const auto superblocks = form_superblocks();
     for (const auto& superblock : superblocks) {

@@ -5,7 +5,7 @@
 int g[8];
 
 // FUNCTION: nested
-// COUNT 0: /^goto L(?!2$)/
+// COUNT 1: /^goto/
 int nested(int n) {
     int sum = 0, i, j;
     for (i = 0; i < n; i++)

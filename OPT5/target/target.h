@@ -32,6 +32,19 @@ long cost_for_DIV_to_MULT_expr(const NODE* t);
 SYMTAB* sort_stack_variables(SYMTAB* list);
 void allocate_regs(); // the pass, over the current function
 
+// The factor, at least 1, by which a loop of one block pays to be unrolled: a divisor of `count`, its number of rounds.
+// `statements` are its body, of which the last is the branch.
+INT65 loop_unrolling_factor(const LIST* statements, INT65 count);
+
+// What unrolling asks of the rooms that know loops and accumulators; null until they are there. Without them every
+// addition of a product to a variable counts as an accumulation.
+struct UNROLLING_SEAMS {
+    NODE* (*normalize_accumulation)(NODE* stmt) = nullptr; // consumes a copy of the statement, returns its normal form
+    bool (*is_serial_mac)(const NODE* stmt) = nullptr;     // the multiply-accumulate hardware runs it
+    bool (*is_OK_for_unrolling)(const NODE* stmt) = nullptr;
+};
+extern UNROLLING_SEAMS unrolling_seams;
+
 // ---- Hooks of a register allocator; nothing to do here
 void find_target_conflicts(NODE* t, BITVEC* live, BITVEC* conflicts, long index);
 void mark_live_across_call(BITVEC* live, NODE* call);

@@ -36,8 +36,7 @@ bool is_plain_scalar(const TYPE* t) {
 }
 
 bool keeps_its_initial_value(const SYMTAB* sym) {
-    if (sym->level != 0 || !sym->type->is_scalar() || sym->type->is_volatile() || sym->type->is_complex()) return false;
-    if (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF) return false;
+    if (!is_plain_scalar(sym->type) || (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF)) return false;
     if (sym->dynamic_init || find_pragma(sym, PRG_WEAK)) return false;
     if (symbol_is_immutable(sym)) return true;
     constexpr unsigned USES = CQ_REFERENCED | CQ_WRITTEN | CQ_ALIASED;
@@ -46,7 +45,7 @@ bool keeps_its_initial_value(const SYMTAB* sym) {
 
 NODE* initial_value_of_name(const NODE* name) {
     const SYMTAB* sym = name->u.sym;
-    if (name->type->is_volatile() || !keeps_its_initial_value(sym)) return nullptr;
+    if (sym->level != 0 || name->type->is_volatile() || !keeps_its_initial_value(sym)) return nullptr;
     return sym->init_value ? copy_tree(sym->init_value) : lookup_autoinit(name);
 }
 
@@ -166,7 +165,10 @@ NODE* written_name(NODE* t) {
     return t->op == NAME ? t : nullptr;
 }
 
-bool assigns(int op) { return opcode_is_ASG(op) || op == LOOP || op == INITLOOP || op == ENDLOOP; }
+bool assigns(int op) {
+    constexpr int WRITES_LEFT = 1;
+    return side_effects[op] == WRITES_LEFT || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
+}
 
 class SWEEP {
 public:
@@ -409,7 +411,7 @@ void fast_CP(int iterations, int combine) {
     if (combine) combine_asgs_to_memory();
     for (int left = iterations; left > 0; --left) {
         sym_split(currfuninfo);
-        init_aliasing_info(true);
+        init_alias_marks();
         SWEEP sweep;
         if (!sweep.run()) return;
         if (!sweep.decided_a_branch) continue;

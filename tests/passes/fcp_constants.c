@@ -130,7 +130,7 @@ int stepped(int n) {
 }
 
 // FUNCTION: part_of_structure
-// HAS: /^t\.a = n/
+// HAS: return n * 2 + 2
 int part_of_structure(int n) {
     struct pair t;
     t.a = n;

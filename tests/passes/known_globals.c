@@ -13,6 +13,17 @@ int* where = &variable;
 static const int grid[2][3] = {{1, 2, 3}, {4, 5, 6}};
 extern const int elsewhere;
 
+static int setting = 30, counted = 1, exposed = 2;
+
+// Nothing in the file writes it.
+// FUNCTION: never_written
+// HAS: return n + 30
+int never_written(int n) { return n + setting; }
+
+// FUNCTION: written_elsewhere
+// HAS: /return .*_counted.*_exposed|return .*_exposed.*_counted/
+int written_elsewhere(void) { return counted + exposed; }
+
 // FUNCTION: scalars
 // HAS: return n + 12
 int scalars(int n) { return n + limit; }
@@ -60,8 +71,15 @@ int written(void) { return variable + changing[1]; }
 // HAS: /return .*&_limit/
 const int* address(void) { return &limit; }
 
+int* expose(void) { return &exposed; }
+void count(void) { counted++; }
+
 int main(void) {
     *where = 9;
+    *expose() = 40;
+    count();
+    put_i16(never_written(3));
+    put_i16(written_elsewhere());
     changing[1] = 3;
     put_i16(scalars(1));
     put_i16(elements(2));

@@ -42,7 +42,9 @@ void convert_value(NODE* t, struct LOOP* loop) {
 // A cast that the store makes again.
 bool cast_is_idle(const NODE* lhs, const NODE* cast) {
     const TYPE *to = lhs->type, *by = cast->type, *from = cast->left->type;
-    if (is_bitfield_access(cast->left) || to->is_bool() || by->is_bool() || from->is_bool()) return false;
+    const bool reads_bitfield =
+        is_bitfield_access(cast->left) || (cast->left->op == SCONV && is_bitfield_access(cast->left->left));
+    if (reads_bitfield || to->is_bool() || by->is_bool() || from->is_bool()) return false;
     if (to->is_float() && by->is_float() && from->is_float()) return by->size == to->size || from->size <= by->size;
     if (!is_integer(to) || !is_integer(by) || !is_integer(from)) return false;
     if (by->size >= to->size) return true;
@@ -365,12 +367,17 @@ NODE* lean_left(NODE* t, int levels) {
 
 // Operands before the last have their effects only, and those once.
 NODE* simp_COMMAOP(NODE* t, struct LOOP*) {
-    if (t->left->op == COMMAOP)
-        t->left->right = peel_for_effect(t->left->right); // what is left of it was peeled before
-    else
+    if (t->left->op == COMMAOP) {
+        NODE* inner = t->left; // what is left of it was peeled before
+        inner->right = peel_for_effect(inner->right);
+        if (inner->right)
+            inner->type = inner->right->type;
+        else
+            t->left = take_left(inner);
+    } else {
         t->left = peel_for_effect(t->left);
-    if (t->left && t->left->op == COMMAOP && !t->left->right) t->left = take_left(t->left);
-    if (!t->left) return take_right(t);
+        if (!t->left) return take_right(t);
+    }
     t->type = t->right->type;
     return lean_left(t, MOST_COMMAS);
 }

@@ -53,13 +53,14 @@ NODE* trivial_constant(NODE* t, struct LOOP* loop) {
 }
 
 // Bits that the constant decides do not count below it; bits that are known need no constant.
-NODE* constant_against_known_bits(NODE* t, struct LOOP*) {
+NODE* constant_against_known_bits(NODE* t, struct LOOP* loop) {
     if (!is_icon(t->right) || t->op == XORB) return nullptr;
     const uint64_t mask = mask_of(t->type), c = bits_of(t->right);
     const KNOWN_BITS k = known_bits(t->left);
     if (t->op == ANDB ? ((k.zeros | c) & mask) == mask : (c & ~k.ones) == 0) return only_left(t);
-    t->left = prop_mask_into_subtree(t->left, INT65(0, t->op == ANDB ? c : mask & ~c));
-    return nullptr;
+    NODE* former = t->left;
+    t->left = prop_mask_into_subtree(former, INT65(0, t->op == ANDB ? c : mask & ~c));
+    return t->left == former ? nullptr : simp_node(t, loop);
 }
 
 // (x & c1) | c2 with no bit left for the mask to clear.

@@ -108,7 +108,7 @@ NODE* constant_for(NODE* t, INT65 value) {
     NODE* left = t->left ? peel_for_effect(t->left) : nullptr;
     NODE* right = t->right ? peel_for_effect(t->right) : nullptr;
     erase_node(t);
-    NODE* effects = left && right ? mk_COMMAOP(left, right) : left ? left : right;
+    NODE* effects = left && right ? simp_node(mk_COMMAOP(left, right), nullptr) : left ? left : right;
     return mk_COMMAOP(effects, result);
 }
 

@@ -140,6 +140,39 @@ NODE* simp_branch_condition(NODE* t, struct LOOP* loop) {
     return t;
 }
 
+template <class F>
+void for_each_case(NODE* t, const F& visit) {
+    for (NODE* list = t->right; list; list = list->op == COMMA ? list->left : nullptr) {
+        NODE* item = list->op == COMMA ? list->right : list;
+        if (item->op == CASE) visit(item->left);
+    }
+}
+
+// SWITCH (x + c) and SWITCH ((long)x): on x, with the cases as it has them.
+NODE* simp_SWITCH(NODE* t) {
+    NODE* value = t->left;
+    const bool adds = is_node_with_icon(value, PLUS);
+    const bool widens = value->op == SCONV && is_integer(value->type) && is_integer(value->left->type) &&
+                        value->left->type->size >= tp->int_t->size && value->left->type->size < value->type->size &&
+                        !is_bitfield_access(value->left);
+    if (!adds && !widens) return t;
+    const INT65 c = adds ? value->right->u.lval : INT65(0);
+    TYPE* type = value->left->type->stqs();
+    bool fits = true;
+    for_each_case(t, [&](const NODE* label) {
+        fits = fits && is_icon(label) && same_integers(label->type, value->type) &&
+               (adds || truncate_to_type(label->u.lval, type) == label->u.lval);
+    });
+    if (!fits) return t;
+    for_each_case(t, [&](NODE* label) {
+        label->type = type;
+        set_icon(label, label->u.lval - c);
+    });
+    if (value->right) erase_node(value->right);
+    t->left = take_left(value);
+    return simp_SWITCH(t);
+}
+
 // A fact that is known says nothing.
 NODE* simp_fact(NODE* t, struct LOOP* loop) {
     if (!t->left || !t->left->type->is_scalar() || t->left->type->is_complex() || t->left->type->is_float()) return t;
@@ -225,6 +258,7 @@ NODE* dispatch(NODE* t, struct LOOP* loop) {
     case MCALL: return simp_ICALL(t, loop);
     case IF:
     case CBRANCH: return simp_branch_condition(t, loop);
+    case SWITCH: return simp_SWITCH(t);
     case ASSERT:
     case NASSERT: return simp_fact(t, loop);
     case VPACK:

@@ -169,6 +169,49 @@ TEST_F(Families, AssignmentsThatWriteMembersAndMemory) {
     check(rows);
 }
 
+TEST_F(Families, SwitchesAreOnTheirVariable) {
+    auto on = [&](NODE* value, long a, long b) {
+        auto entry = [&](long v, int label) {
+            return maketree(CASE, icon(v, value->type), mk_LABELREF(label), tp->int_t);
+        };
+        NODE* dflt = maketree(DEFAULT, mk_LABELREF(3), nullptr, tp->int_t);
+        return maketree(SWITCH, value, args(args(entry(a, 1), entry(b, 2)), dflt), tp->int_t);
+    };
+    NODE* switches[] = {on(bin(PLUS, x(), icon(5)), 4, -32768), on(un(SCONV, x(), tp->long_t), 4, 9),
+                        on(un(SCONV, x(), tp->long_t), 4, 70000)};
+    const char* expected[] = {"SWITCH (x) { case -1: goto L1; case 32763: goto L2; default: goto L3; }",
+                              "SWITCH (x) { case 4: goto L1; case 9: goto L2; default: goto L3; }",
+                              "SWITCH ((long)x) { case 4L: goto L1; case 70000L: goto L2; default: goto L3; }"};
+    for (int i = 0; i < 3; ++i) {
+        NODE* t = simp_tree(switches[i], nullptr);
+        EXPECT_EQ(stmt2infix(t), expected[i]);
+        erase_tree(t);
+    }
+}
+
+// Without strict floating point a division is by the reciprocal; powers of one base are joined.
+TEST_F(Families, RelaxedFloatingPointAndPowers) {
+    SYMTAB *n = symbol("n", tp->int_t), *base = symbol("e", tp->double_t);
+    auto power = [&](NODE* b, NODE* e) { return maketree(EXPT, b, e, b->type); };
+    auto d = [&] { return name(ds); };
+    auto small = [&](long mask) { return bin(ANDB, name(n), icon(mask)); };
+    const ROW strict[] = {{bin(DIV, d(), fcon("3.0")), "d / 3.0"},
+                          {bin(MULT, power(d(), icon(3)), d()), "EXPT(d, 3) * d"},
+                          {bin(MULT, power(x(), icon(3)), power(x(), small(7))), "EXPT(x, (n & 7) + 3)"},
+                          {bin(MULT, power(x(), icon(3)), x()), "EXPT(x, 4)"},
+                          {bin(MULT, power(x(), name(n)), x()), "EXPT(x, n) * x"}, // n may be negative
+                          {bin(MULT, d(), power(name(base), icon(2))), "EXPT(e, 2) * d"}};
+    const ROW relaxed[] = {{bin(DIV, d(), fcon("3.0")), "d * 0.333333"},
+                           {bin(DIV, d(), fcon("0.0")), "d / 0.0"},
+                           {bin(MULT, power(d(), icon(3)), d()), "EXPT(d, 4)"}};
+    const auto former = strict_fp;
+    strict_fp = 1;
+    check(strict);
+    strict_fp = 0;
+    check(relaxed);
+    strict_fp = former;
+}
+
 TEST_F(Families, TermsAreBroughtToTheTop) {
     NODE* target = x();
     struct CASE {

@@ -70,7 +70,8 @@ bool expr_product_may_overflow(const NODE* tree, struct LOOP* loop); // also tru
 
 // ---- Partial evaluation
 // A new tree without the parts that vary in `loop`, whose value is never below (above) the tree's in any iteration.
-// Parts are replaced by their bounds. Where `must_be_bounded`, null if a part has no better bound than its type's.
+// Parts are replaced by their bounds. Null if a part that varies is no integer; where `must_be_bounded`, also if it has
+// no better bound than its type's.
 NODE* partially_eval_for_maximum(const NODE* tree, struct LOOP* loop, bool must_be_bounded);
 NODE* partially_eval_for_minimum(const NODE* tree, struct LOOP* loop, bool must_be_bounded);
 // Consumes the tree, whose value is known to be one of low, low + step, ... up to high; the result has that value

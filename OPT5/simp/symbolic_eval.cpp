@@ -23,8 +23,8 @@ public:
 
     NODE* build(const NODE* t, bool up, int levels) {
         if (!varies(t)) return copy_tree(t);
-        if (!has_value_range(t->type)) return nullptr;
-        if (levels > 0 && !t->type->is_bool() && !t->type->is_enum())
+        if (!has_value_range(t->type) || t->type->is_enum()) return nullptr;
+        if (levels > 0 && !t->type->is_bool())
             if (NODE* r = monotone(t, up, levels - 1)) return r;
         return bound(t, up);
     }

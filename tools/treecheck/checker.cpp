@@ -58,6 +58,23 @@ NODE* bubbled(NODE* t, struct LOOP*) {
     return t;
 }
 
+// x = c, e with x not written in e: e under the knowledge that x is c.
+bool begins_with_known_value(const NODE* t) {
+    if (t->op != COMMAOP || t->left->op != ASG || t->left->left->op != NAME || t->left->right->op != ICON) return false;
+    const SYMTAB* x = t->left->left->u.sym;
+    if (x->level == 0 || x->is_aliased() || x->type->is_volatile() || !x->type->is_int()) return false;
+    bool is_written = false;
+    for_each_node(t->right, [&](const NODE* n) {
+        is_written = is_written || (opcode_is_ASG(n->op) && n->left->op == NAME && n->left->u.sym == x);
+    });
+    return !is_written;
+}
+NODE* with_known_value(NODE* t, struct LOOP*) {
+    const NODE* x = t->left->left;
+    t->right = simp_subst_icon(truncate_to_type(t->left->right->u.lval, x->type), x->type->stqs(), x, t->right);
+    return t;
+}
+
 bool is_integer(const NODE* t) { return t->type->is_int() && !t->type->is_bool(); }
 template <uint64_t MASK>
 NODE* masked(NODE* t, struct LOOP* loop) {
@@ -84,6 +101,7 @@ const std::vector<OPERATION> operations = {
     {"assoc", nullptr, reassociated, nullptr, true},
     {"address", nullptr, as_address, nullptr, true},
     {"bubble", nullptr, bubbled, nullptr, true},
+    {"known value", begins_with_known_value, with_known_value, nullptr, true},
     {"mask 1", is_integer, masked<1>, same_bits<1>, true},
     {"mask ff", is_integer, masked<0xFF>, same_bits<0xFF>, true},
     {"mask 8000", is_integer, masked<0x8000>, same_bits<0x8000>, true},

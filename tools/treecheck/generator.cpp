@@ -89,6 +89,7 @@ INT65 GENERATOR::number(TYPE* type) {
 
 NODE* GENERATOR::constant(TYPE* type) {
     if (!type->is_float()) {
+        if (type->is_enum()) type = normalized_underlying_type(type); // no constant is beyond its type
         NODE* t = mk_ICON(INT65(0), type);
         t->u.lval = number(type);
         return t;
@@ -293,7 +294,9 @@ NODE* GENERATOR::integer_operator(TYPE* type, int depth) {
     NODE* a = operand(type, depth);
     switch (random.pick(9)) {
     case 0: return unary(random.pick(2) ? UMINUS : NOTB, a, type);
-    case 1: return unary(random.pick(3) ? ABS : SQR, a, type);
+    case 1:
+        if (random.one_in(3)) return binary(EXPT, a, mk_ICON(INT65(random.pick(5)), type), type);
+        return unary(random.pick(3) ? ABS : SQR, a, type);
     case 2:
     case 3: {
         NODE* count = random.pick(8) ? mk_ICON(INT65(random.pick(static_cast<unsigned>(type->size))), tp->int_t)
@@ -454,7 +457,9 @@ NODE* GENERATOR::tree() {
         erase_tree(t);
         t = value(type, depth);
     }
-    return t;
+    SYMTAB* x = favourite();
+    if (!options.effects || !x->type->is_int() || random.pick(6)) return t;
+    return binary(COMMAOP, binary(ASG, mk_NAME(x), constant(x->type), x->type), t, type);
 }
 
 } // namespace treecheck

@@ -3,6 +3,7 @@
 #include "tools/treecheck/checker.h"
 
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
 
 namespace treecheck {
 
@@ -57,7 +58,7 @@ void add_values(const NODE* t, std::vector<const NODE*>* out) {
 std::vector<NODE*> candidates(const NODE* t) {
     std::vector<NODE*> out;
     const FORM own = form_of(t->type);
-    TYPE* type = t->type->stqs();
+    TYPE* type = normalized_value_type(t->type->stqs());
     std::vector<const NODE*> operands;
     add_values(t->left, &operands);
     add_values(t->right, &operands);

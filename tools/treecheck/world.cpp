@@ -69,6 +69,8 @@ public:
             for (const char* n : {"1", "2"}) w.integers.push_back(object(std::string(name) + n, type));
         }
         w.integers.push_back(object("i3", tp->int_t, 2, SC_REGISTER));
+        w.integers.push_back(object("e1", tp->mk_enum("sign", tp->int_t, 16, 16, false)));
+        w.integers.push_back(object("e2", tp->mk_enum("color", tp->uint_t, 16, 16, false)));
         for (const char* n : {"f1", "f2"}) w.floats.push_back(object(n, tp->float_t));
         for (const char* n : {"d1", "d2"}) w.floats.push_back(object(n, tp->double_t));
         w.globals = {object("gi", tp->int_t, 0, SC_EXTERN), object("gl", tp->long_t, 0, SC_STATIC),

@@ -163,18 +163,18 @@ bool exponents_add(const NODE* n, const NODE* m, const TYPE* type, struct LOOP* 
 
 NODE* simp_powers(NODE* t, struct LOOP* loop) {
     NODE *l = t->left, *r = t->right;
-    if (!is_integer(l->right->type)) return t;
-    if (!compatible_types(l->type, t->type, true) || !compatible_types(r->type, t->type, true)) return t;
-    if (same_base(l, r)) { // x ** n * x
-        NODE* one = mk_ICON(INT65(1), l->right->type->stqs());
-        t->right = r = maketree(EXPT, r, one, l->type, r->ls);
-    }
-    if (r->op != EXPT || !same_value(l->left, r->left) || !same_integers(l->right->type, r->right->type) ||
-        !exponents_add(l->right, r->right, t->type, loop))
+    if (!is_integer(l->right->type) || !compatible_types(l->type, t->type, true) ||
+        !compatible_types(r->type, t->type, true))
         return t;
-    l->right = made(PLUS, l->right, r->right, l->right->type->stqs(), loop);
-    erase_tree(r->left);
-    erase_node(r);
+    const bool once = same_base(l, r), both = !once && r->op == EXPT && same_value(l->left, r->left);
+    if (!once && !(both && same_integers(l->right->type, r->right->type))) return t;
+    NODE* exponent = once ? mk_ICON(INT65(1), l->right->type->stqs()) : copy_tree(r->right); // x is x ** 1
+    if (!exponents_add(l->right, exponent, t->type, loop)) {
+        erase_tree(exponent);
+        return t;
+    }
+    erase_tree(r);
+    l->right = made(PLUS, l->right, exponent, l->right->type->stqs(), loop);
     return simp_node(take_left(t), loop);
 }
 

@@ -72,8 +72,3 @@ void make_symbol_groupable(SYMTAB* sym);
 // ---- Questions
 PRAGMA* symbol_has_pragma(const SYMTAB* sym, int kind);
 bool symbol_is_preemptible(const SYMTAB* sym);
-// By the form of the demangled name.
-bool fun_is_cpp_static_initializer(const FUNINFO* f);
-bool fun_is_cpp_constructor(const FUNINFO* f);
-bool fun_is_cpp_destructor(const FUNINFO* f);
-inline bool fun_is_cpp_op_new(const FUNINFO*) { return false; }

@@ -192,6 +192,11 @@ FUNINFO* find_FUNINFO(const char* name);
 FUNINFO* find_FUNINFO(SYMTAB* sym);
 FUNINFO* find_FUNINFO_for_call(const NODE* call);
 bool function_is_defined(FUNINFO* f);
+// By the form of the demangled name.
+bool fun_is_cpp_static_initializer(const FUNINFO* f);
+bool fun_is_cpp_constructor(const FUNINFO* f);
+bool fun_is_cpp_destructor(const FUNINFO* f);
+inline bool fun_is_cpp_op_new(const FUNINFO*) { return false; }
 bool is_system_function(const char* name);
 bool func_is_nonconforming(const SYMTAB* sym);
 void add_nonconforming_function(const SYMTAB* sym);

@@ -16,6 +16,8 @@
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
 
 #include <vector>
 
@@ -39,6 +41,34 @@ bool is_combinable(const LIST* first, const LIST* second) {
     return b->left->op == NAME || (!tree_has_side_effects(a->right) && !tree_has_side_effects(b->left));
 }
 
+// ---- Swaps
+
+bool is_float_copy(const NODE* t) {
+    if (t->op != ASG || t->left->op != NAME || t->right->op != NAME) return false;
+    for (const NODE* side : {t->left, t->right})
+        if (!side->type->is_float() || side->type->size != 32 || lvalue_is_volatile(side)) return false;
+    return !tree_is_arg_prolog(t);
+}
+
+// `t = a; a = b; b = t;` from this cell on.
+bool starts_swap(const LIST* s) {
+    if (!s->rest || !s->rest->rest || !s->rest->rest->rest) return false;
+    const NODE *save = s->first, *first = s->rest->first, *second = s->rest->rest->first;
+    if (!is_float_copy(save) || !is_float_copy(first) || !is_float_copy(second)) return false;
+    const SYMTAB *t = save->left->u.sym, *a = save->right->u.sym, *b = first->right->u.sym;
+    return first->left->u.sym == a && second->left->u.sym == b && second->right->u.sym == t && t != a && t != b &&
+           a != b;
+}
+
+NODE* make_swap(const NODE* a, const NODE* b) {
+    auto reference = [](const NODE* name) {
+        return maketree(ARGREF, copy_tree(name), nullptr, tp->mk_ptr(name->type));
+    };
+    return mk_MCALL("__swapf", maketree(COMMA, reference(a), reference(b), tp->int_t), tp->void_t);
+}
+
+bool target_swaps_floats() { return (float_support | 1) == 11 && cpu_version == 28 && find_BIF_descriptor("__swapf"); }
+
 class ELIMINATION final : public BACKWARD_WALK {
 public:
     int count = 0;
@@ -48,7 +78,7 @@ public:
         *bb->live_sets[LIVE_OUT] = live;
         std::vector<LIST*> cells;
         for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
-        COPY copy;
+        COPY copy, copy_behind; // of the next statement and of the one behind it
         bool kills = true, dropped = false;
         for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
             LIST* s = *it;
@@ -57,6 +87,13 @@ public:
                 live.clear(static_cast<uint32_t>(copy.from));
                 ++count;
             }
+            if (swaps && copy_behind.cell && starts_swap(s) && s->rest->rest == copy_behind.cell) {
+                replace_by_swap(s, copy_behind.from);
+                copy = copy_behind = COPY();
+                ++count;
+                continue;
+            }
+            copy_behind = copy;
             copy = copy_at(s);
             const bool is_dispatch = tree_is_EH_SWITCH(s->first);
             statement(s->first, kills);
@@ -77,6 +114,22 @@ private:
             else
                 live.set_all();
         }
+    }
+
+    // The variables are read and written by the call; the one that held the value is not live in front of it.
+    void replace_by_swap(LIST* s, int saved) {
+        LIST *first = s->rest, *second = first->rest;
+        for (const NODE* name : {s->first->right, first->first->right})
+            if (int bit = live_index(name->u.sym); bit >= 0) live.set(static_cast<uint32_t>(bit));
+        live.clear(static_cast<uint32_t>(saved));
+        NODE* swap = make_swap(s->first->right, first->first->right);
+        s->rest = second->rest;
+        for (LIST* gone : {first, second}) {
+            erase_tree(gone->first);
+            delete gone;
+        }
+        erase_tree(s->first);
+        s->first = swap;
     }
 
     COPY copy_at(LIST* s) {
@@ -113,6 +166,7 @@ private:
     void removed() override { ++count; }
 
     BITVEC live;
+    const bool swaps = target_swaps_floats();
 };
 
 // A block that lost all but its jump lets the graph be smaller.
@@ -167,6 +221,7 @@ int elim_dead_assigns(bool keep_embedded, bool) {
     FUNINFO* f = currfuninfo;
     if (!f || !f->bb_list) return 0;
     sym_split(f);
+    if (TEST_FLAG(f, FUN_is_cpp)) remove_unneeded_stores_from_destructor();
     find_live_variables(1, true);
     if (f->lva_sym_count == 0) return 0;
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'elim_dead_assigns' ----------\n");

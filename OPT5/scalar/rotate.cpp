@@ -138,10 +138,20 @@ constexpr int MAX_RUN = 32; // blocks
 
 bool falls_through(const BBLK* bb) { return bb->dflink && edge_memberp(bb->dflink, bb->successors); }
 
+// What a pragma promises is promised of the loop that follows in the text, so what stands behind one stays there. The
+// mark of the loop's place in the source promises nothing.
+bool ends_in_promise(const BBLK* bb) {
+    constexpr uint8_t SRC_LOOP = 41;
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (s->first->op == PPRAGMA && s->first->pragma->kind != SRC_LOOP) return true;
+    return false;
+}
+
 // The blocks from `first` that control falls along; null if that holds `without` or the entry, or is long. `first`
 // itself must not be fallen into.
 BBLK* end_of_run(BBLK* first, const BBLK* without) {
-    if (first == currfuninfo->bb_list || falls_through(first->rdflink)) return nullptr;
+    if (first == currfuninfo->bb_list || falls_through(first->rdflink) || ends_in_promise(first->rdflink))
+        return nullptr;
     BBLK* last = first;
     for (int n = 0; last != without; last = last->dflink) {
         if (!falls_through(last)) return last;

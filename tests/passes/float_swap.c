@@ -1,0 +1,37 @@
+// Three assignments that exchange two variables become the target's exchange; a value that is still needed keeps them.
+// RUN: --opt_level=1 --float_support=fpu32 --disable_inlining
+#include <zrun.h>
+
+static void show(float a, float b) {
+    put_f32(a);
+    put_f32(b);
+}
+
+// FUNCTION: exchanged
+// COUNT 1: __swapf(
+// COUNT 0: t = 
+void exchanged(float a, float b, int n) {
+    while (n-- > 0) {
+        float t = a;
+        a = b;
+        b = t;
+    }
+    show(a, b);
+}
+
+// FUNCTION: kept
+// COUNT 0: __swapf(
+float kept(float a, float b) {
+    float t = a;
+    a = b;
+    b = t;
+    show(a, b);
+    a = b + t;
+    return a * t;
+}
+
+int main(void) {
+    for (int n = 0; n < 3; n++) exchanged(1.5F, -2.0F, n);
+    put_f32(kept(3.0F, 4.0F));
+    return 0;
+}

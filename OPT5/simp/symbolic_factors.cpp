@@ -229,6 +229,12 @@ unsigned trailing_zeros_of_tree(const NODE* tree, struct LOOP* loop) {
 }
 
 INT65 max_ICON_factor(const NODE* tree, struct LOOP* loop, bool no_signed_overflow) {
+    while (tree->op == VPACKM || ((tree->op == PCONV || tree->op == ISP2CHAR) && tree->left->type->is_pointer()))
+        tree = tree->left;                                        // of each lane; of the address
+    if (tree->op == PCONV && has_value_range(tree->left->type)) { // a number as an address
+        const FACTOR f = factor_as(tree->left, tp->ulong_t, loop);
+        return f ? INT65(0, f) : greatest_power(tree->type);
+    }
     if (!has_value_range(tree->type)) return 1;
     const FACTOR f = factor_of(tree, loop, no_signed_overflow);
     return f ? INT65(0, f) : greatest_power(tree->type);

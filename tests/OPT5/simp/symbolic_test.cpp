@@ -332,6 +332,10 @@ TEST_F(Symbolic, Factors) {
         {un(SCONV, times(x(), 4), tp->bool_t), 1, 1},
         {bin(MINUS, x(), x()), 32768, 32768}, // zero
         {fcon("4.0"), 1, 1},
+        {un(PCONV, times(x(), 12), tp->mk_ptr(tp->int_t)), 4, 4},
+        {un(PCONV, un(PCONV, c(24), tp->mk_ptr(tp->long_t)), tp->mk_ptr(tp->int_t)), 24, 24},
+        {un(VPACKM, times(x(), 4), tp->mk_vector(tp->int_t, false, 2)), 4, 4},
+        {variable("p", tp->mk_ptr(tp->int_t)), 1, 1},
     };
     for (const ROW& row : rows) {
         EXPECT_EQ(max_ICON_factor(row.tree, nullptr), INT65(row.factor)) << show(row.tree);

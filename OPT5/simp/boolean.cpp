@@ -34,6 +34,20 @@ NODE* compare_with_zero(NODE* t, int int_op, int float_op, struct LOOP* loop) {
     return simp_node(maketree(int_op, t, coerce_to_type(t->type->stqs(), zero), tp->int_t, ls), loop);
 }
 
+// The lanes of a mask that are zero, as numbers of the lanes' size.
+NODE* compare_mask_with_zero(NODE* t) {
+    const uint32_t lanes = t->type->real->num_elem();
+    const TYPE* etype = nullptr;
+    for (TYPE* number : {tp->int_t, tp->long_t, tp->llong_t})
+        if (number->size * lanes == t->type->size) etype = number;
+    if (!etype) return maketree(NOTB, t, nullptr, t->type, t->ls);
+    OPT_ASSERT(TYPE_IS_SCALAR(etype));
+    TYPE *mask = t->type, *numbers = tp->mk_vector(const_cast<TYPE*>(etype), false, lanes);
+    NODE* zeros = mk_integer_constant(INT65(0), numbers);
+    return maketree(EQ, exact_types(mask, numbers) ? t : maketree(VRCONV, t, nullptr, numbers, t->ls), zeros, mask,
+                    t->ls);
+}
+
 bool is_integral(const NODE* t) { return t->type->is_int() || t->type->is_enum(); }
 bool is_scalar_number(const NODE* t) { return t->type->is_scalar() && !t->type->is_float() && !t->type->is_complex(); }
 
@@ -189,6 +203,7 @@ NODE* invert_boolean_tree(NODE* t) {
         t->op = boolean_inv[t->op];
         return t;
     }
+    if (t->type->is_vector()) return compare_mask_with_zero(t);
     const TYPE* etype = t->type;
     OPT_ASSERT(TYPE_IS_SCALAR(etype));
     return compare_with_zero(t, EQ, FEQ, nullptr);

@@ -295,13 +295,13 @@ NODE* simp_node(NODE* t, struct LOOP* loop) {
 
 namespace {
 
-// An assertion is not simplified by what it says itself.
-NODE* simp_assertion(NODE* t, struct LOOP* loop) {
+// An assertion is not simplified by what it says itself: neither by the facts of the function nor by those of a loop.
+NODE* simp_assertion(NODE* t) {
     std::vector<NODE*> givens;
     if (currfuninfo) std::swap(givens, currfuninfo->givens);
-    t->left = simp_tree(t->left, loop);
-    t->right = simp_tree(t->right, loop);
-    t = simp_node(t, loop);
+    t->left = simp_tree(t->left, nullptr);
+    t->right = simp_tree(t->right, nullptr);
+    t = simp_node(t, nullptr);
     if (currfuninfo) std::swap(givens, currfuninfo->givens);
     return t;
 }
@@ -326,13 +326,13 @@ NODE* simp_tree(NODE* tree, struct LOOP* loop) {
         PLACE& place = open.back();
         NODE* t = *place.link;
         if (t->op == ASSERT && t != tree) {
-            *place.link = simp_assertion(t, loop);
+            *place.link = simp_assertion(t);
             open.pop_back();
         } else if (place.operands_are_done || (!t->left && !t->right)) {
             if (!place.is_lvalue || !is_chosen_place(t)) *place.link = simp_node(t, loop);
             open.pop_back();
         } else {
-            if (t == tree && t->op == ASSERT) return simp_assertion(t, loop);
+            if (t == tree && t->op == ASSERT) return simp_assertion(t);
             place.operands_are_done = true;
             if (t->right) open.push_back({&t->right, false, false});
             if (t->left) open.push_back({&t->left, false, has_lvalue(t)});

@@ -118,6 +118,7 @@ TEST_F(Families, VectorsAndComplexValues) {
     SYMTAB* vs = symbol("v", pair);
     auto lane = [&](int i) { return maketree(VFIELD, name(vs), icon(i), tp->int_t); };
     auto pack = [&](NODE* list) { return maketree(VPACK, list, nullptr, pair); };
+    EXPECT_EQ(show(invert_boolean_tree(name(vs))), "v == VPACKM(0)");
     TYPE* complex = tp->mk_complex(tp->float_t);
     SYMTAB *hs = symbol("h", tp->float_t), *gs = symbol("g", tp->float_t), *cs = symbol("c", complex);
     auto make = [&] { return maketree(COMPLEX, name(hs), name(gs), complex); };

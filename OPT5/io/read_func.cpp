@@ -15,6 +15,7 @@
 #include "OPT5/mvp/mvp.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
+#include "OPT5/scalar/lowering.h"
 #include "OPT5/scalar/profile.h"
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/seq.h"
@@ -353,6 +354,7 @@ void OPT_CLIENT::cl_end_func(PSN* psn) {
     add_return_pointer_assertion();
     seq_trees(opt_level() >= 2 ? propagate_global_constants : nullptr);
     buildcfg();
+    remove_tail_recursion();
     simpcfg(0, 0);
     fast_CP(4, 1);
     preprocess_fundef(f);

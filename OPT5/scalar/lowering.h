@@ -1,6 +1,13 @@
 // Passes that rewrite forms of the source into plainer ones, and back ahead of the output.
 #pragma once
 
+class NODE;
+
+// Calls that the current function makes of itself as its last act become jumps to its start. Behind `buildcfg`.
+void remove_tail_recursion();
+// Whether a statement saves the environment, to which control may come back later.
+bool calls_setjmp(const NODE* tree);
+
 // Bit-field accesses become operations on their containers.
 void expand_bitfields();
 

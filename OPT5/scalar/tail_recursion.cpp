@@ -1,0 +1,259 @@
+// A call that a function makes of itself as its last act becomes new values for its parameters and a jump to the start.
+//
+// The frame of the caller is gone then while the callee runs, so no address of anything in it may be known to anyone,
+// and nothing may depend on which frame it is: no handler, no saved environment, no part of the argument list beyond
+// the named parameters. `restrict` speaks of one activation; a pointer that bears it keeps its value.
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/lowering.h"
+#include "OPT5/scalar/simpcfg.h"
+#include "OPT5/simp/simp.h"
+
+#include <algorithm>
+#include <cstring>
+#include <vector>
+
+namespace {
+
+constexpr int ASM_COMMENT = 47;
+
+struct PARAMETER {
+    SYMTAB* parm;
+    SYMTAB* local; // what the prolog copies it into; null for one that isn't used
+};
+
+struct NEW_VALUE {
+    SYMTAB* local;
+    NODE* value; // owned
+};
+
+template <class F>
+void for_each_local(const F& visit) {
+    const FUNINFO* f = currfuninfo;
+    for (SYMTAB* list : {f->new_syms, f->pending_syms, f->memory_syms, f->scalar_syms})
+        for (SYMTAB* s = list; s; s = s->next) visit(s);
+}
+
+std::vector<PARAMETER> parameters() {
+    std::vector<PARAMETER> list;
+    for_each_local([&](SYMTAB* s) {
+        if (s->level == 1 && s->written_as_parameter) list.push_back({s, map_parm_to_sym(s)});
+    });
+    std::sort(list.begin(), list.end(), [](const PARAMETER& a, const PARAMETER& b) {
+        return a.parm->order_of_reading < b.parm->order_of_reading;
+    });
+    return list;
+}
+
+bool may_be_assigned(const PARAMETER& p) {
+    if (!p.parm->type->is_scalar() || p.parm->type->is_volatile()) return false;
+    return !p.local || (p.local->type->is_scalar() && !p.local->type->is_volatile() && !p.local->type->is_const());
+}
+
+bool reads_parameter_record(const NODE* t) {
+    return tree_contains_matching_node(t, [](const NODE* n) { return n->op == NAME && n->u.sym->level == 1; });
+}
+
+class TAIL_RECURSION {
+public:
+    void run() {
+        FUNINFO* f = currfuninfo;
+        if (opt_level() < 2 || !f->bb_list || f->has_eh() || !find_calls() || !frame_is_private()) return;
+        bool changed = false;
+        for (BBLK* bb : calls) changed |= convert(bb);
+        if (!changed) return;
+        sym_split(f);
+        rebuildcfg();
+        reset_alias_info();
+    }
+
+private:
+    static bool calls_itself(const NODE* t) { return op_is_call(t->op) && get_callee_for_call(t) == currfunc; }
+
+    static bool leads_only_to_exit(const BBLK* bb) {
+        const BBLK* to = bb->successors && !bb->successors->rest ? bb->successors->first : nullptr;
+        for (int steps = 0; to && to != currfuninfo->exit_bb; ++steps) {
+            const LIST* only = to->statements;
+            if (steps == 8 || !only || only->rest || only->first->op != BRANCH) return false;
+            to = to->successors ? to->successors->first : nullptr;
+        }
+        return to != nullptr;
+    }
+
+    // The cell of the block's tail call, or null.
+    static LIST* tail_call(const BBLK* bb) {
+        LIST* last = bb->last_statement();
+        if (!last) return nullptr;
+        if (last->first->op == RETURN) return last->first->right && calls_itself(last->first->right) ? last : nullptr;
+        if (last->first->op != BRANCH || !leads_only_to_exit(bb)) return nullptr;
+        LIST* before = bb->statements;
+        if (before == last) return nullptr;
+        while (before->rest != last) before = before->rest;
+        return calls_itself(before->first) ? before : nullptr;
+    }
+
+    bool find_calls() {
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            if (tail_call(bb)) calls.push_back(bb);
+        return !calls.empty();
+    }
+
+    bool frame_is_private() {
+        const TYPE* type = currfunc->type->getr(TYPE::tpk_func);
+        if (type->vararg() || type->return_type()->is_csu() || currfuninfo->csu_return_sym) return false;
+        parms = parameters();
+        if (!std::all_of(parms.begin(), parms.end(), may_be_assigned)) return false;
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (const LIST* s = bb->statements; s; s = s->rest) {
+                if (bb == currfuninfo->bb_list && s == bb->statements && tree_is_arg_prolog(s->first)) continue;
+                if (reads_parameter_record(s->first) || calls_setjmp(s->first)) return false;
+            }
+        init_aliasing_info(false);
+        bool is_private = true;
+        for_each_local([&](const SYMTAB* s) { is_private &= !s->is_aliased(); });
+        return is_private;
+    }
+
+    // The block behind the prolog, made when it is first asked for.
+    BBLK* start() {
+        if (start_bb) return start_bb;
+        BBLK* entry = currfuninfo->bb_list;
+        LIST* first = entry->statements;
+        if (tree_is_arg_prolog(first->first)) return start_bb = split_block(entry, first, false);
+        // Without parameters the start is all of the block; what it is split behind goes again.
+        entry->statements = first = mkelist(nullptr, first, first->psn);
+        start_bb = split_block(entry, first, false);
+        entry->statements = first->rest;
+        delete first;
+        return start_bb;
+    }
+
+    bool arguments_fit(const NODE* call) const {
+        NODE* args = call->op == CALL ? call->right : nullptr;
+        if (arg_list_count(args) != static_cast<int>(parms.size()) || !call->u.lval.is_zero()) return false;
+        for (size_t i = 0; i < parms.size(); ++i) {
+            const NODE* arg = arg_list_lookup(args, static_cast<int>(i));
+            if (arg->op == STARG || arg->op == ARGREF || !arg->type->is_scalar() || arg->type->is_complex())
+                return false;
+            const SYMTAB* local = parms[i].local;
+            const bool keeps_value = arg->op == NAME && arg->u.sym == local;
+            if (local && (local->type->qual_kind(false) & QUAL_RESTRICT) && !keeps_value) return false;
+        }
+        return true;
+    }
+
+    // The value that the prolog would store.
+    static NODE* as_passed(const PARAMETER& p, NODE* arg) {
+        arg = coerce_to_type(p.parm->type->stqs(), arg);
+        return p.local ? coerce_to_type(p.local->type->stqs(), arg) : arg;
+    }
+
+    bool convert(BBLK* bb) {
+        LIST* cell = tail_call(bb);
+        NODE* call = cell->first->op == RETURN ? cell->first->right : cell->first;
+        if (!arguments_fit(call)) return false;
+        BBLK* const to = start(); // may split the block of the call: if that is the entry
+        if (bb == currfuninfo->bb_list) bb = to;
+        report(cell);
+
+        std::vector<NEW_VALUE> values;
+        bool has_effects = false;
+        for (size_t i = 0; i < parms.size(); ++i) {
+            const NODE* arg = arg_list_lookup(call->right, static_cast<int>(i));
+            values.push_back({parms[i].local, simp_tree(as_passed(parms[i], copy_tree(arg)), nullptr)});
+            has_effects |= tree_has_side_effects(values.back().value);
+        }
+        LIST *first = nullptr, **end = &first;
+        auto add = [&](NODE* t) { *end = mkelist(t, nullptr, cell->psn), end = &(*end)->rest; };
+        if (source_interlist) add(mk_ASM(ASM_COMMENT, source_text(cell).c_str()));
+        if (has_effects) evaluate_in_order(values, add);
+        assign_together(values, add);
+        add(mk_ASM(ASM_COMMENT, "***\t; tail recursive call occurs here"));
+        add(mk_BRANCH(to));
+        replace_tail(bb, cell, first);
+        while (bb->successors) disconnect(bb, bb->successors->first);
+        connect(bb, to);
+        return true;
+    }
+
+    static std::string source_text(const LIST* cell) {
+        return ";" + stmt2infix(cell->first) + (cell->first->op == RETURN ? "" : "  return;");
+    }
+
+    static void report(const LIST* cell) {
+        if (!print_debug) return;
+        debug_printf("\n  ===> Tail recursive self-call removed at line %ld: %s\n\n", cell->psn ? cell->psn->line : 0L,
+                     stmt2infix(cell->first).c_str());
+    }
+
+    static void replace_tail(BBLK* bb, LIST* cell, LIST* tail) {
+        LIST** link = &bb->statements;
+        while (*link != cell) link = &(*link)->rest;
+        erase_tree_list(cell);
+        *link = tail;
+    }
+
+    // Each value goes through a temporary, or away if only its effects count.
+    template <class F>
+    static void evaluate_in_order(std::vector<NEW_VALUE>& values, const F& add) {
+        for (NEW_VALUE& v : values) {
+            if (!v.local) {
+                if (NODE* effect = peel_for_effect(v.value)) add(effect);
+                v.value = nullptr;
+                continue;
+            }
+            if (v.value->op == ICON) continue;
+            SYMTAB* temp = sym_temp('T', -1, v.local->type->stqs(), nullptr);
+            add(mk_ASG(mk_NAME(temp), v.value));
+            v.value = mk_NAME(temp);
+        }
+    }
+
+    // All parameters take their values at once: one is assigned when no value that is still to come reads it.
+    template <class F>
+    static void assign_together(std::vector<NEW_VALUE> values, const F& add) {
+        auto is_done = [](const NEW_VALUE& v) {
+            const bool done = !v.local || (v.value->op == NAME && v.value->u.sym == v.local);
+            if (done && v.value) erase_tree(v.value);
+            return done;
+        };
+        values.erase(std::remove_if(values.begin(), values.end(), is_done), values.end());
+        while (!values.empty()) {
+            auto is_free = [&](const NEW_VALUE& v) {
+                return std::none_of(values.begin(), values.end(), [&](const NEW_VALUE& other) {
+                    return other.local != v.local && sym_appears_in_tree(v.local, other.value);
+                });
+            };
+            auto next = std::find_if(values.begin(), values.end(), is_free);
+            if (next == values.end()) { // they read each other in a ring
+                next = values.begin();
+                SYMTAB* saved = sym_temp('T', -1, next->local->type->stqs(), nullptr);
+                add(mk_ASG(mk_NAME(saved), mk_NAME(next->local)));
+                for (NEW_VALUE& other : values)
+                    if (other.local != next->local)
+                        other.value = subst_sym_for_sym_in_tree(next->local, saved, other.value);
+            }
+            add(mk_ASG(mk_NAME(next->local), next->value));
+            values.erase(next);
+        }
+    }
+
+    std::vector<PARAMETER> parms;
+    std::vector<BBLK*> calls;
+    BBLK* start_bb = nullptr;
+};
+
+} // namespace
+
+bool calls_setjmp(const NODE* t) {
+    return tree_contains_matching_node(t, [](const NODE* n) {
+        const SYMTAB* callee = op_is_call(n->op) ? get_callee_for_call(n) : nullptr;
+        return callee && !std::strcmp(skip_name_prefix(callee->name), "setjmp");
+    });
+}
+
+void remove_tail_recursion() { TAIL_RECURSION().run(); }

@@ -103,6 +103,15 @@ private:
     BBLK *A = nullptr, *B = nullptr, *C = nullptr, *D = nullptr, *E, *F = nullptr;
 };
 
+// What a pragma promises is promised of the loop that follows in the text, by its label: what stands behind one stays
+// there, and that label stays in use. The mark of the loop's place in the source promises nothing.
+bool ends_in_promise(const BBLK* bb) {
+    constexpr uint8_t SRC_LOOP = 41;
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (s->first->op == PPRAGMA && s->first->pragma->kind != SRC_LOOP) return true;
+    return false;
+}
+
 // ---- A loop whose test still stands on top
 
 constexpr int MAX_TEST_NODES = 12;
@@ -115,6 +124,8 @@ const NODE* test_on_top(const BBLK* bb) {
     const LIST* test = head->statements;
     if (head->dfn > bb->dfn || bb->dflink == head || !test || test->rest || test->first->op != IF) return nullptr;
     if (test->first->left->op == ENDLOOP || count_nodes_in_tree(test->first->left) > MAX_TEST_NODES) return nullptr;
+    for (const EDGE* e = head->predecessors; e; e = e->rest)
+        if (ends_in_promise(e->first)) return nullptr;
     return test->first;
 }
 
@@ -138,15 +149,6 @@ constexpr int MAX_RUN = 32; // blocks
 
 bool falls_through(const BBLK* bb) { return bb->dflink && edge_memberp(bb->dflink, bb->successors); }
 
-// What a pragma promises is promised of the loop that follows in the text, so what stands behind one stays there. The
-// mark of the loop's place in the source promises nothing.
-bool ends_in_promise(const BBLK* bb) {
-    constexpr uint8_t SRC_LOOP = 41;
-    for (const LIST* s = bb->statements; s; s = s->rest)
-        if (s->first->op == PPRAGMA && s->first->pragma->kind != SRC_LOOP) return true;
-    return false;
-}
-
 // The blocks from `first` that control falls along; null if that holds `without` or the entry, or is long. `first`
 // itself must not be fallen into.
 BBLK* end_of_run(BBLK* first, const BBLK* without) {
@@ -154,7 +156,7 @@ BBLK* end_of_run(BBLK* first, const BBLK* without) {
         return nullptr;
     BBLK* last = first;
     for (int n = 0; last != without; last = last->dflink) {
-        if (!falls_through(last)) return last;
+        if (!falls_through(last)) return ends_in_promise(last) ? nullptr : last;
         if (++n == MAX_RUN) break;
     }
     return nullptr;

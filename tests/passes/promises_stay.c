@@ -1,4 +1,4 @@
-// A loop's pragma is followed by that loop, however the blocks are laid out.
+// A loop's pragma is followed by that loop's own label, however the blocks are laid out.
 // RUN: --opt_level=2
 #include <zrun.h>
 
@@ -20,9 +20,35 @@ long two_loops(int n) {
     return sum;
 }
 
+// FUNCTION: nested
+// HAS: /MUST_ITERATE\("", "4"/
+// NOT: /k \+= 1/
+// HAS: /j \+= 1/
+// HAS: /MUST_ITERATE\("", "2"/
+// NOT: /j \+= 1/
+// HAS: /k \+= 1/
+long nested(int n) {
+    long sum = 0;
+    int u, k, j;
+    for (u = 0; u <= n; u++) {
+#pragma MUST_ITERATE(, 2)
+        for (k = 1; k < 3; k++) sum += g[n] * k;
+        g[1] = u;
+#pragma MUST_ITERATE(, 4)
+        for (j = 0; j < n; j++) {
+            if (g[j] > n) sum -= j;
+            else g[2] = (int)sum;
+            sum = sum * 7 + g[j];
+        }
+    }
+    return sum;
+}
+
 int main(void) {
     for (int i = 0; i < 8; i++) g[i] = i * i;
     put_i32(two_loops(8));
     put_i32(two_loops(0));
+    put_i32(nested(4));
+    put_i32(nested(0));
     return 0;
 }

@@ -3,5 +3,3 @@
 #include "OPT5/scalar/lcse.h"
 
 void lcse() {}
-void lcse_subrange_assignments() {}
-void elim_dead_subrange_assigns() {}

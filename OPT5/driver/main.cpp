@@ -48,6 +48,7 @@ bool optimize_unit(int argc, char** argv) {
     init_BIF_descriptors();
     init_simplifier();
     init_live_variables();
+    init_allocation_seam();
     setup_passes(true);
     if (pass_debug_parser) {
         parse_md_file(false);

@@ -35,6 +35,11 @@ bool combine_assignments(LIST* cell);
 // A destructor need not store to members that no later statement reads.
 void remove_unneeded_stores_from_destructor();
 
+// Puts the assignment in front of a test into it, where the test compares the variable with a constant: the value need not be
+// read again. Needs the bits of the candidates.
+void prop_asg_into_if(BBLK* bb);
+void init_allocation_seam(); // once: lets `allocate_regs` ask for it
+
 // ---- Assignments inside expressions become statements of their own, in front of where they stood
 void promote_all_embedded_assignments();
 bool promote_embedded_assignments_in_bb(BBLK* bb); // whether it made any

@@ -138,12 +138,15 @@ NODE* lower_address(NODE* t) {
 
 } // namespace
 
+void (*prepare_allocation_hook)() = nullptr;
+
 void allocate_regs() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LIST* stmt = bb->statements; stmt; stmt = stmt->rest)
             stmt->first = rewrite_tree(stmt->first, lower_address);
     sym_split(currfuninfo);
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'allocate_regs' ----------\n");
+    if (prepare_allocation_hook && currfuninfo->bb_list) prepare_allocation_hook();
     init_reg_defs();
     sort_stack_variables(currfuninfo->new_syms);
     sort_stack_variables(currfuninfo->scalar_syms);

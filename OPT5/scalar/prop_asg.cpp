@@ -1,0 +1,53 @@
+// What the assignment of registers asks of the data flow before it begins.
+
+#include "OPT5/scalar/eda.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/target/target.h"
+
+namespace {
+
+// The one read of a condition that compares a variable with a constant, or is the variable itself.
+NODE** tested_variable(NODE** condition) {
+    NODE* t = *condition;
+    if (t->op == NAME) return condition;
+    const bool compares = op_is_int_compare(t->op) || op_is_float_compare(t->op);
+    const bool with_constant = compares && (t->right->op == ICON || t->right->op == FCON);
+    return with_constant && t->left->op == NAME ? &t->left : nullptr;
+}
+
+} // namespace
+
+void prop_asg_into_if(BBLK* bb) {
+    for (LIST** link = &bb->statements; *link && (*link)->rest; link = &(*link)->rest) {
+        LIST *s = *link, *test = s->rest;
+        if (test->rest) continue;
+        NODE* asg = s->first;
+        if (test->first->op != IF || (asg->op != ASG && op_of_opASG[asg->op] == ILLOP) || asg->left->op != NAME) return;
+        if (live_index(asg->left->u.sym) < 0 || lvalue_is_volatile(asg->left) || tree_is_arg_prolog(asg)) return;
+        NODE** read = tested_variable(&test->first->left);
+        if (!read || (*read)->u.sym != asg->left->u.sym) return;
+        erase_tree(*read);
+        *read = asg;
+        *link = test;
+        delete s;
+        return;
+    }
+}
+
+namespace {
+
+void prepare_allocation() {
+    find_live_variables(0, false);
+    reset_alias_info();
+    BBLK* const entry = currfuninfo->bb_list;
+    for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) prop_asg_into_if(bb);
+    lva_cleanup();
+}
+
+} // namespace
+
+void init_allocation_seam() { prepare_allocation_hook = prepare_allocation; }

@@ -43,7 +43,7 @@ TEST_F(ReadTest, CountedLoopsBecomeBranchesOnTheCounter) {
     ret(name(y));
     end();
     // The decrement is compared with -1: false, and so back to the label, while the counter was not 0.
-    expect_lines({"x = 3", "L1:", "y += 1", "x -= 1", "if (!(x == -1)) goto L1", "return y"});
+    expect_lines({"x = 3", "L1:", "y += 1", "if (!((x -= 1) == -1)) goto L1", "return y"});
 }
 
 TEST_F(ReadTest, TheHeadOfACountedLoopKeepsItsEffect) {
@@ -52,7 +52,7 @@ TEST_F(ReadTest, TheHeadOfACountedLoopKeepsItsEffect) {
     statement(node(op::ENDLOOP, pkg.int_t, name(x), ref(4)));
     ret(name(x));
     end();
-    expect_lines({"x = 3", "L1:", "x -= 1", "if (!(x == -1)) goto L1"});
+    expect_lines({"x = 3", "L1:", "if (!((x -= 1) == -1)) goto L1"});
 }
 
 TEST_F(ReadTest, PointerScalingIsMultiplicationByAddressUnits) {

@@ -29,7 +29,7 @@ TEST_F(WriteTest, ALoopAtTheEndBranchesBackWithoutAnExtraJump) {
     label(2);
     ret(name(x));
     end();
-    expect_lines({"L1:", "x += 1", "if (!(x >= 10)) goto L1", "return x"});
+    expect_lines({"L1:", "if (!((x += 1) >= 10)) goto L1", "return x"});
 }
 
 TEST_F(WriteTest, ASwitchNamesAllItsTargetsAndCountsItsCases) {

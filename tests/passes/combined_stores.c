@@ -106,7 +106,8 @@ void watched(void) {
 }
 
 // FUNCTION: fields
-// COUNT 2: _s.field =
+// COUNT 1: _s.field =
+// HAS: _s.field = 2
 void fields(void) {
     s.field = 1;
     s.field = 2;

@@ -7,9 +7,8 @@ int g, h;
 // FUNCTION: commas
 // HAS: _g = 3
 // HAS: _h = 4
-// HAS: _g = 5
 // COUNT 0: /, _/
-void commas(void) { g = 3, h = 4, g = 5; }
+void commas(void) { g = 3, h = 4; }
 
 // FUNCTION: header
 // HAS: _h = 1

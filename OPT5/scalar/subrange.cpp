@@ -1,5 +1,5 @@
-// Parts of objects within a block: a store that a later store covers before anything reads it goes, and a load of a part
-// whose value a variable or a constant is known to hold takes that.
+// Parts of objects within a block: a store that a later store covers before anything reads it goes, and a load of a
+// part whose value a variable or a constant is known to hold takes that.
 //
 // Facts begin and end with the block. Whether an access between may meet a part is left to the alias rules.
 
@@ -17,6 +17,8 @@
 #include <vector>
 
 namespace {
+
+constexpr std::size_t MOST_KNOWN = 32; // facts at a time, which keeps long blocks linear
 
 // Bits `offset` to `offset + size` of the object that `base` names or, where it is no NAME, points to.
 struct SUBRANGE {
@@ -79,7 +81,10 @@ public:
                 dropped |= !t;
             }
             // What the store itself takes counts as read in front of it.
-            if (target && completes) overwritten.push_back(*target);
+            if (target && completes) {
+                if (overwritten.size() == MOST_KNOWN) overwritten.erase(overwritten.begin());
+                overwritten.push_back(*target);
+            }
             if (t) note_accesses(t, target);
             completes = !is_dispatch;
         }
@@ -169,9 +174,7 @@ private:
     // Only parts that are evaluated before the statement changes anything: both sides of an assignment, or all of it.
     void reuse(NODE*& t) {
         if (tree_contains_op(t, ASM) || tree_is_arg_prolog(t)) return;
-        if (!is_plain_assignment(t)) {
-            return;
-        }
+        if (!is_plain_assignment(t)) return;
         if (tree_has_side_effects(t->left) || tree_has_side_effects(t->right)) return;
         const NODE* before = t->right;
         t->right = reuse_in(t->right);
@@ -239,7 +242,6 @@ private:
         known.clear();
     }
 
-    static constexpr std::size_t MOST_KNOWN = 32; // keeps long blocks linear
     std::vector<KNOWN> known;
 };
 

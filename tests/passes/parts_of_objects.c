@@ -31,7 +31,7 @@ int read_between(struct pair* p, int x) {
 }
 
 // FUNCTION: read_by_the_store
-// HAS: /17/
+// HAS: /\* 17/
 void read_by_the_store(struct pair* p, int x) {
     p->a = x * 17;
     p->a = p->a ^ p->a >> 3;

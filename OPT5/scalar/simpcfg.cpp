@@ -40,6 +40,31 @@ void redirect(BBLK* bb, LIST* control, BBLK* from, BBLK* to) {
     to->predecessors = add_edge(bb, to->predecessors, prob);
 }
 
+constexpr uint8_t MUST_ITERATE = 39, PROB_ITERATE = 40, SRC_LOOP = 41;
+
+bool is_written_as_do(const PRAGMA* p) { return p->kind == SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
+
+// A loop that has nothing but its test left, which stood on top, evaluates that once more than it went round: a pragma
+// in front of it promised something of the iterations, and a reader would take it for the tests.
+void drop_promises_of(BBLK* loop) {
+    for (const EDGE* e = loop->predecessors; e; e = e->rest) {
+        if (e->first == loop) continue;
+        bool tested_last = false;
+        for (LIST** link = &e->first->statements; *link && (*link)->rest;) {
+            LIST* s = *link;
+            const PRAGMA* p = s->first->op == PPRAGMA ? s->first->pragma : nullptr;
+            if (p && is_written_as_do(p)) tested_last = true;
+            if (tested_last || !p || (p->kind != MUST_ITERATE && p->kind != PROB_ITERATE)) {
+                link = &s->rest;
+                continue;
+            }
+            *link = s->rest;
+            erase_tree(s->first);
+            delete s;
+        }
+    }
+}
+
 // The block that a SWITCH on a constant reaches.
 BBLK* target_of_constant_switch(const NODE* sw) {
     const INT65 value = sw->left->u.lval;
@@ -132,6 +157,7 @@ private:
         if (bb->is_in_LIR_form()) return false;
         bool changed = thread(bb);
         LIST* control = control_of(bb);
+        if (control->first->op == IF && edge_memberp(bb, bb->successors)) drop_promises_of(bb);
         if (BBLK* target = decided_target(control->first)) {
             const std::vector<BBLK*> old = successors_of(bb);
             make_branch(bb, control, target);

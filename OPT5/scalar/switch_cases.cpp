@@ -103,6 +103,7 @@ private:
     void take_apart() {
         for (NODE* t = sw->right; t; t = t->op == COMMA ? t->left : nullptr) {
             NODE* element = t->op == COMMA ? t->right : t;
+            if (t->op == COMMA) commas.push_back(t);
             if (element->op == DEFAULT)
                 dflt = element;
             else
@@ -288,11 +289,8 @@ private:
     void rebuild_list() {
         NODE* list = nullptr;
         auto append = [&](NODE* element) { list = list ? maketree(COMMA, list, element, tp->int_t, sw->ls) : element; };
-        for (NODE* t = sw->right; t;) {
-            NODE* comma = t->op == COMMA ? t : nullptr;
-            t = comma ? comma->left : nullptr;
-            if (comma) erase_node(comma);
-        }
+        for (NODE* comma : commas) erase_node(comma);
+        commas.clear();
         for (CASE_ELEMENT& c : cases) {
             c.tree->left->type = sw->left->type;
             c.tree->left->u.lval = c.value;
@@ -309,6 +307,7 @@ private:
     NODE* sw;
     NODE* dflt = nullptr;
     std::vector<CASE_ELEMENT> cases;
+    std::vector<NODE*> commas; // of the list as it was; elements of it may be gone
     INT65 min, max, factor, offset;
     uint64_t possible_bits = ~uint64_t(0);
     int64_t range = 0;

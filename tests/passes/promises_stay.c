@@ -44,11 +44,24 @@ long nested(int n) {
     return sum;
 }
 
+// What is promised of the iterations of a loop is not promised of its tests.
+// FUNCTION: only_a_test
+// COUNT 0: MUST_ITERATE
+void only_a_test(void) {
+    unsigned w;
+#pragma MUST_ITERATE(, 2, 2)
+    for (w = 2; w-- > 0;) {
+    }
+    g[3] = (int)w;
+}
+
 int main(void) {
     for (int i = 0; i < 8; i++) g[i] = i * i;
     put_i32(two_loops(8));
     put_i32(two_loops(0));
     put_i32(nested(4));
     put_i32(nested(0));
+    only_a_test();
+    put_i16(g[3]);
     return 0;
 }

@@ -33,6 +33,18 @@ int impossible(unsigned x) {
     return g;
 }
 
+// FUNCTION: first_impossible
+// COUNT 0: case 20
+// HAS: /case 3: /
+int first_impossible(unsigned x) {
+    switch (x & 7) {
+    case 20: g = 77; break;
+    case 3: g = 10; break;
+    default: g = 5;
+    }
+    return g;
+}
+
 // FUNCTION: stride
 // COUNT 0: case 5
 // HAS: /switch .*case 1: .*case 2: /
@@ -77,6 +89,7 @@ int main(void) {
         put_i16(full((unsigned)i));
         put_i16(impossible((unsigned)i));
         put_i16(stride((unsigned)i));
+        put_i16(first_impossible((unsigned)i));
         put_i16(open(i));
         put_i16(sparse((unsigned)i));
     }

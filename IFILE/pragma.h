@@ -8,6 +8,7 @@
 // The pragma kinds that this system knows by number. The other kinds up to 128 pass through unchanged.
 enum PRAGMA_KIND : uint8_t {
     PRG_DATA_ALIGN = 0,
+    PRG_DATA_SECTION = 2,
     PRG_FUNC_NEVER_RETURNS = 3,
     PRG_FUNC_CANNOT_INLINE = 4,
     PRG_FUNC_NO_GLOBAL_ASG = 5,
@@ -16,12 +17,17 @@ enum PRAGMA_KIND : uint8_t {
     PRG_FUNC_IS_SYSTEM = 8,
     PRG_FUNC_EXT_CALLED = 23,
     PRG_OPT_OVERRIDE = 36,
+    PRG_MUST_ITERATE = 39,
+    PRG_PROB_ITERATE = 40,
+    PRG_SRC_LOOP = 41,
     PRG_SRC_LANGUAGE = 49,
     PRG_FL_STATIC = 51,
     PRG_SYM_IS_REFERENCED = 52,
     PRG_FUNC_IS_NONCONFORMING = 54,
     PRG_LOOP_FLAGS = 57,
     PRG_SYM_IS_DEAD = 59,
+    PRG_COMDAT_GROUP = 69,
+    PRG_SWITCH_IS_FULL = 70, // 'F': no value leads to the default
     PRG_SYM_VISIBILITY = 72,
     PRG_FS_DYNAMIC_INIT = 74,
     PRG_FUNC_ESPEC = 75,

@@ -15,7 +15,6 @@
 namespace {
 
 constexpr uint16_t ALL_USES = CQ_REFERENCED | CQ_WRITTEN | CQ_ALIASED;
-constexpr int PRG_DATA_SECTION = 2;
 
 bool is_only_read(const SYMTAB* s) { return (s->cqual & ALL_USES) == CQ_REFERENCED; }
 bool is_data_definition(const SYMTAB* s) {
@@ -77,7 +76,8 @@ void rescan_uses() {
         for (NODE* item : *s->autoinit)
             if (item->op != ENDINIT) rescan_symbol_uses(item);
         const bool one_value = s->autoinit->size() == 2 && s->type->is_scalar(); // the value and the end
-        if (!s->init_value && one_value && expr_is_constant(s->autoinit->front())) s->init_value = copy_tree(s->autoinit->front());
+        if (!s->init_value && one_value && expr_is_constant(s->autoinit->front()))
+            s->init_value = copy_tree(s->autoinit->front());
     }
     if (program.assembly.empty()) return;
     for (SYMTAB* s = global_symbols; s; s = s->next)

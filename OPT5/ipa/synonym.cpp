@@ -12,8 +12,6 @@
 
 namespace {
 
-constexpr int PRG_COMDAT_GROUP = 69;
-
 std::set<std::string> synonym_targets; // without prefix, as pragmas name them
 
 const PRAGMA* comdat_group(const SYMTAB* sym) { return find_pragma(sym, PRG_COMDAT_GROUP); }

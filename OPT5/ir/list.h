@@ -43,5 +43,6 @@ NODE* pair_left_child(const NODEPAIRLIST* list); // of the pair's first
 LIST* mkelist(NODE* tree, LIST* rest, PSN* psn);
 LIST* mklist(NODE* tree, LIST* rest, uint16_t flag1, uint16_t flag2);
 LLIST* mklistlist(LIST* list, LLIST* next);
-LIST* reverse_list(LIST* list); // in place
-LIST* last_cell(LIST* list);    // null for an empty list
+LIST* reverse_list(LIST* list);     // in place
+LIST* last_cell(LIST* list);        // null for an empty list
+void drop_empty_cells(LIST** list); // those whose tree went

@@ -102,7 +102,7 @@ public:
             dropped = true;
             copy.cell = nullptr;
         }
-        if (dropped) unlink_empty_cells(bb);
+        if (dropped) drop_empty_cells(&bb->statements);
     }
 
 private:
@@ -143,18 +143,6 @@ private:
         copy.cell = s;
         copy.from = from;
         return copy;
-    }
-
-    static void unlink_empty_cells(BBLK* bb) {
-        for (LIST** link = &bb->statements; *link;) {
-            LIST* s = *link;
-            if (s->first) {
-                link = &s->rest;
-                continue;
-            }
-            *link = s->rest;
-            delete s;
-        }
     }
 
     void read(int bit) override { live.set(static_cast<uint32_t>(bit)); }

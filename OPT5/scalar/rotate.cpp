@@ -106,9 +106,8 @@ private:
 // What a pragma promises is promised of the loop that follows in the text, by its label: what stands behind one stays
 // there, and that label stays in use. The mark of the loop's place in the source promises nothing.
 bool ends_in_promise(const BBLK* bb) {
-    constexpr uint8_t SRC_LOOP = 41;
     for (const LIST* s = bb->statements; s; s = s->rest)
-        if (s->first->op == PPRAGMA && s->first->pragma->kind != SRC_LOOP) return true;
+        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
     return false;
 }
 

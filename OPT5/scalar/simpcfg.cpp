@@ -40,9 +40,7 @@ void redirect(BBLK* bb, LIST* control, BBLK* from, BBLK* to) {
     to->predecessors = add_edge(bb, to->predecessors, prob);
 }
 
-constexpr uint8_t MUST_ITERATE = 39, PROB_ITERATE = 40, SRC_LOOP = 41;
-
-bool is_written_as_do(const PRAGMA* p) { return p->kind == SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
+bool is_written_as_do(const PRAGMA* p) { return p->kind == PRG_SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
 
 // A loop that has nothing but its test left, which stood on top, evaluates that once more than it went round: a pragma
 // in front of it promised something of the iterations, and a reader would take it for the tests.
@@ -54,7 +52,7 @@ void drop_promises_of(BBLK* loop) {
             LIST* s = *link;
             const PRAGMA* p = s->first->op == PPRAGMA ? s->first->pragma : nullptr;
             if (p && is_written_as_do(p)) tested_last = true;
-            if (tested_last || !p || (p->kind != MUST_ITERATE && p->kind != PROB_ITERATE)) {
+            if (tested_last || !p || (p->kind != PRG_MUST_ITERATE && p->kind != PRG_PROB_ITERATE)) {
                 link = &s->rest;
                 continue;
             }

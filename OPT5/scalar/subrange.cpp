@@ -89,7 +89,7 @@ public:
             completes = !is_dispatch;
         }
         overwritten.clear();
-        if (dropped) unlink_empty_cells(bb);
+        if (dropped) drop_empty_cells(&bb->statements);
     }
 
 private:
@@ -119,18 +119,6 @@ private:
                    (lhs->op != NAME && tree_touches_lvalue(lhs->left, s.lvalue));
         };
         overwritten.erase(std::remove_if(overwritten.begin(), overwritten.end(), ends), overwritten.end());
-    }
-
-    static void unlink_empty_cells(BBLK* bb) {
-        for (LIST** link = &bb->statements; *link;) {
-            LIST* s = *link;
-            if (s->first) {
-                link = &s->rest;
-                continue;
-            }
-            *link = s->rest;
-            delete s;
-        }
     }
 
     std::vector<SUBRANGE> overwritten; // later in the block, and not read up to there

@@ -25,7 +25,6 @@
 namespace {
 
 constexpr int64_t MAX_RANGE = 500;
-constexpr int PRG_SWITCH_IS_FULL = 70; // 'F': no value leads to the default
 
 struct CASE_ELEMENT {
     INT65 value; // as the control's type holds it

@@ -179,8 +179,6 @@ void straighten_traces_in_cfg() {
 
 namespace {
 
-constexpr uint8_t PRG_MUST_ITERATE = 39, PRG_PROB_ITERATE = 40;
-
 bool has_iteration_pragma(const BBLK* bb) {
     for (const LIST* s = bb->statements; s; s = s->rest)
         if (s->first->op == PPRAGMA &&

@@ -1,8 +1,7 @@
 // Built-in functions of the target whose result their operands and their definition fix; each row of the table is the
 // definition. Three conventions hold for all of them:
-//   - a function that is marked as free of side effects is a function of its operands alone: a rotation is one of the
-//   32
-//     bits of its operand, without the carry;
+//   - a function that is marked as free of side effects is a function of its operands alone: a rotation is one of its
+//     operand's 32 bits, without the carry;
 //   - a repeated step (__rpt_...) is done as often as the last operand says, and not at all for a count below 1;
 //   - a product in fixed point is exact in 64 bits, shifted right arithmetically and cut to its type.
 // What hangs on more than the operands, or is not settled, is listed in `refused` with the reason.

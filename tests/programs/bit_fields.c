@@ -77,7 +77,7 @@ int main(void) {
     struct record list[4] = {{5, 100, 0}, {1, -30, 0}, {5, -512, 0}, {7, 511, 1}};
     unsigned i;
     put_u32(gather(&f));
-    for (i = 0; i < 65000u; i += 9999u) {
+    for (i = 0; i < 60000u; i += 9999u) {
         fill(&shared, i);
         put_u32(gather(&shared));
     }

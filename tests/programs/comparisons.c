@@ -66,20 +66,19 @@ int main(void) {
     for (i = 0; i < 6; i++) {
         for (j = 0; j < 6; j++) {
             int a = values[i], b = values[j];
-            put_i16(by_int(a, b));
-            put_i16(by_unsigned((unsigned)a, (unsigned)b));
-            put_i16(by_long(a, b * 65536L));
-            put_i16(by_ulong((unsigned long)a, (unsigned long)b));
-            put_i16(by_wide(a * 4294967296LL, b));
-            put_i16(by_uwide((unsigned long long)a, (unsigned long long)b));
-            put_i16(mixed(a, (unsigned)b));
-            put_i16(mixed_long((unsigned)a, b));
-            put_i16(mixed_ulong(a, (unsigned long)b));
-            put_i16(three_way(a, b));
+            unsigned long sum = by_int(a, b);
+            sum = sum * 64 + by_unsigned((unsigned)a, (unsigned)b);
+            sum = sum * 64 + by_long(a, b * 65536L);
+            sum = sum * 64 + by_ulong((unsigned long)a, (unsigned long)b);
+            sum = sum * 64 + by_wide(a * 4294967296LL, b);
+            put_u32(sum);
+            sum = by_uwide((unsigned long long)a, (unsigned long long)b);
+            sum = sum * 64 + mixed(a, (unsigned)b);
+            sum = sum * 64 + mixed_long((unsigned)a, b);
+            sum = sum * 64 + mixed_ulong(a, (unsigned long)b);
+            put_u32(sum * 64 + three_way(a, b));
         }
-        put_i16(edges(values[i]));
-        put_i16(unsigned_edges((unsigned)values[i]));
-        put_i16(sign(values[i]));
+        put_u32((edges(values[i]) * 64 + unsigned_edges((unsigned)values[i])) * 64L + sign(values[i]));
     }
     for (i = 5; i < 25; i += 5) put_i16(ranges(i));
     put_i16(ranges(-5));

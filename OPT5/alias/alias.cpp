@@ -40,10 +40,6 @@ PTR* record_of(const NODE* lvalue) {
     return base ? find_or_make_PTR_entry(const_cast<NODE*>(base)) : nullptr;
 }
 
-bool is_automatic(const SYMTAB* sym) {
-    return sym->level >= 2 && (sym->sclass == SC_AUTO || sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2);
-}
-
 // The parameter that all values of a pointer come from, null for none: pointers from it never reach what was made after
 // the function was entered.
 const SYMTAB* parameter_behind(const NODE* lvalue) {
@@ -62,14 +58,14 @@ bool is_string_access(const NODE* lvalue) {
 
 // A fixed address may be the place of a global that the linker was told to put there.
 bool is_placed_by_linker_alone(const SYMTAB* sym) {
-    return is_automatic(sym) || (sym->sclass != SC_EXTERN && !sym->pragma);
+    return sym->is_automatic() || (sym->sclass != SC_EXTERN && !sym->pragma);
 }
 
 // `object` is accessed by one lvalue; the other, `indirect`, has no known object.
 bool is_out_of_reach(const SYMTAB* object, const NODE* indirect, const ADDRESS_FORM& form) {
     if (object->is_function()) return false;
     if (!may_be_reached_by_pointers(object)) return true;
-    if (is_automatic(object) && parameter_behind(indirect)) return true;
+    if (object->is_automatic() && parameter_behind(indirect)) return true;
     if (form.is_absolute()) return is_placed_by_linker_alone(object);
     return is_string_access(indirect);
 }

@@ -318,3 +318,8 @@ bool sym_appears_in_EHT(const SYMTAB* sym) {
         if (item.cleanup && sym_appears_in_tree(sym, item.cleanup)) return true;
     return false;
 }
+
+bool only_its_name_reaches(const SYMTAB* sym) {
+    if (!sym->is_automatic() && !(sym->level > 0 && sym->sclass == SC_PARM)) return false;
+    return !sym->is_aliased() && !sym->type->is_volatile() && !sym_appears_in_EHT(sym);
+}

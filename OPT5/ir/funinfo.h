@@ -206,3 +206,6 @@ void dump_FUNINFO(FUNINFO* f, int to_info); // to_info 0: the debug stream
 void dump_function_header(bool to_info = false); // of the current function, to the debug stream, and the info stream on request
 void erase_all();                           // drops the current function's body
 bool sym_appears_in_EHT(const SYMTAB* sym); // of the current function
+// Whether nothing but its NAME in the statements of the current function reads or writes the object: a parameter or an
+// automatic variable that is not volatile, not aliased as the marks stand, and in no exception's clean-up.
+bool only_its_name_reaches(const SYMTAB* sym);

@@ -132,6 +132,10 @@ public:
 
     bool is_function() const { return type && type->is_func(); }
     bool is_global() const { return level == 0; }
+    // A local that each call of its function has anew; parameters are not.
+    bool is_automatic() const {
+        return level >= 2 && (sclass == SC_AUTO || sclass == SC_REGISTER || sclass == SC_REGISTER2);
+    }
 };
 
 // A file-scope symbol whose per-function state is kept in the current FUNINFO, so that it can be in work in two functions

@@ -125,14 +125,6 @@ bool compound_ASG_computes_in(TYPE* wanted, int op, const NODE* x, const NODE* e
 
 namespace {
 
-// A variable that nothing but its own NAME can change.
-bool is_private_name(const NODE* t) {
-    if (t->op != NAME || !t->u.sym || t->type->is_volatile()) return false;
-    const SYMTAB* sym = t->u.sym;
-    return sym->level == 2 && (sym->sclass == SC_AUTO || sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2) &&
-           !sym->is_aliased() && !sym->type->is_volatile();
-}
-
 // The operands that an lvalue's address is computed from.
 bool address_has_side_effects(const NODE* lvalue) {
     switch (lvalue->op) {
@@ -172,7 +164,9 @@ NODE* opASG_to_ASG(NODE* tree) {
     if (op == ILLOP) return tree;
     NODE *x = tree->left, *e = tree->right;
     if (x->op == DDNODE || address_has_side_effects(x)) return tree;
-    if (tree_has_side_effects(e) && !(is_private_name(x) && !sym_appears_in_tree(x->u.sym, e))) return tree;
+    if (tree_has_side_effects(e) && !(x->op == NAME && !x->type->is_volatile() && only_its_name_reaches(x->u.sym) &&
+                                      !sym_appears_in_tree(x->u.sym, e)))
+        return tree;
     NODE* value = copy_tree(x);
     TYPE* inner;
     if (op == SLL || op == SRL) {

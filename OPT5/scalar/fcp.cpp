@@ -153,10 +153,6 @@ struct COUNTS {
     bool is_pinned = false;
 };
 
-bool is_automatic(const SYMTAB* sym) {
-    return sym->level == 2 && (sym->sclass == SC_AUTO || sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2);
-}
-
 // The NAME that a write goes to, wholly or in part; null where it goes through a pointer.
 NODE* written_name(NODE* t) {
     while (t->op == STDOT || t->op == REAL || t->op == IMAG || t->op == VFIELD || t->op == SIMDHI || t->op == SIMDLO ||
@@ -254,7 +250,7 @@ void SWEEP::count() {
 // ---- Judging
 
 bool SWEEP::has_one_value(SYMTAB* sym, const COUNTS& c) const {
-    return c.definitions == 1 && c.definition && !c.is_pinned && is_automatic(sym) && is_plain_scalar(sym->type) &&
+    return c.definitions == 1 && c.definition && !c.is_pinned && sym->is_automatic() && is_plain_scalar(sym->type) &&
            !sym->is_aliased() && sym != currfuninfo->ret_by_cctor_sym && sym != currfuninfo->csu_return_sym;
 }
 
@@ -296,7 +292,7 @@ void SWEEP::judge() {
         const COUNTS& c = counts[s];
         if (print_debug && !c.definitions && !c.uses)
             debug_printf("\tNo references in the function for '%s'\n", s->name);
-        else if (print_debug && !c.definitions && is_automatic(s) && !is_internal_symbol(s))
+        else if (print_debug && !c.definitions && s->is_automatic() && !is_internal_symbol(s))
             debug_printf("\n\tVariable is used but never assigned: %s\n", s->name);
         keep_parameter(s, c);
         if (is_propagable(s, c)) candidates.insert(s);

@@ -28,26 +28,13 @@ int live_index(const SYMTAB* sym) {
 
 namespace {
 
-bool is_candidate(const SYMTAB* sym) {
-    OPT_ASSERT(sym->level > 0);
-    switch (sym->sclass) {
-    case SC_AUTO:
-    case SC_REGISTER:
-    case SC_REGISTER2:
-    case SC_PARM: break;
-    default: return false;
-    }
-    if (sym->is_aliased() || sym->type->is_volatile() || !sym->type->is_scalar()) return false;
-    return !currfuninfo->has_eh() || !sym_appears_in_EHT(sym);
-}
-
 void number_candidates() {
     FUNINFO* f = currfuninfo;
     int count = 0;
     for (SYMTAB* list : {f->scalar_syms, f->memory_syms})
         for (SYMTAB* sym = list; sym; sym = sym->next) {
             if (sym->level == 0) continue;
-            if (count == NOT_A_CANDIDATE || !is_candidate(sym)) {
+            if (count == NOT_A_CANDIDATE || !sym->type->is_scalar() || !only_its_name_reaches(sym)) {
                 sym->set_bitnum(NOT_A_CANDIDATE);
                 continue;
             }

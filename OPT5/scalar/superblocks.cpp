@@ -23,14 +23,10 @@ register_option pass_disable_superblock_opt("disable:superblock_opt");
 
 namespace {
 
-bool is_private(const SYMTAB* sym) {
-    if (!sym || sym->level == 0 || sym->is_aliased() || sym->type->is_volatile() || !sym->type->is_scalar())
-        return false;
-    if (sym->sclass != SC_AUTO && sym->sclass != SC_REGISTER && sym->sclass != SC_REGISTER2) return false;
-    return !currfuninfo->has_eh() || !sym_appears_in_EHT(sym);
+bool is_private_name(const NODE* t) {
+    return t->op == NAME && t->u.sym && t->type->is_scalar() && !t->type->is_volatile() &&
+           only_its_name_reaches(t->u.sym);
 }
-
-bool is_private_name(const NODE* t) { return t->op == NAME && is_private(t->u.sym) && !t->type->is_volatile(); }
 
 // A change of a value behind its back: the root of the statement is looked at apart.
 void collect_written(NODE* t, std::unordered_set<const SYMTAB*>& written) {

@@ -8,7 +8,6 @@ void expand_bitfields() {}
 void convert_sti_to_cinit() {}
 void build_stack_sharing_type() {}
 void subst_csu_returning_temp_for_local_var() {}
-void unsimplify() {}
 void expand_cluster_refs() {}
 void collect_clustered_symbols() {}
 void add_instrumentation_exit_routine_to_atexit() {}

@@ -32,7 +32,6 @@ NODE* simp_relop(NODE* t, struct LOOP* loop);
 NODE* simp_QUEST(NODE* t, struct LOOP* loop);
 NODE* simp_EXCLAIM(NODE* t, struct LOOP* loop);
 NODE* simp_OROR(NODE* t, struct LOOP* loop);     // and ANDAND
-NODE* join_compares(NODE* t, struct LOOP* loop); // of two compares under ANDB or ORB one, or null
 
 // ---- Casts
 NODE* simp_SCONV(NODE* t, struct LOOP* loop);

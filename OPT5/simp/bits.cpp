@@ -4,6 +4,7 @@
 // sides taken out; casts that only widen outside. What the bits decide is decided.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/compare.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"

@@ -4,6 +4,7 @@
 // subtracted or cast on both sides is taken away where the order stays; a compare of a truth value with a constant is
 // that value or its opposite; an unsigned compare with 0 or 1 is an equality.
 
+#include "OPT5/simp/compare.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/rule.h"
@@ -112,6 +113,20 @@ NODE* compare_truth_value(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
+// A value of zero or one bit in an order with a constant: whether it is zero.
+NODE* compare_single_bit(NODE* t, struct LOOP* loop) {
+    if (!is_icon(t->right) || is_equality(t) || !is_node_with_icon(t->left, ANDB)) return nullptr;
+    const INT65 bit = t->left->right->u.lval, c = t->right->u.lval;
+    const uint64_t bits = bits_of(t->left->right);
+    if ((bits & (bits - 1)) != 0) return nullptr;
+    auto outcome_for = [&](INT65 v) { return accepts(t->op, v < c ? -1 : v > c); };
+    const bool of_0 = outcome_for(INT65(0)), of_bit = outcome_for(bit);
+    if (of_0 == of_bit) return decided(t, of_0);
+    t->op = of_bit ? NEQ : EQ;
+    set_icon(t->right, INT65(0));
+    return simp_node(t, loop);
+}
+
 // At the end of the range an order is an equality: u < 1, u >= 1, u <= 0, u > 0, x >= max.
 NODE* order_at_the_end(NODE* t, struct LOOP* loop) {
     if (is_equality(t) || !is_icon(t->right)) return nullptr;
@@ -178,6 +193,10 @@ NODE* undo_on_constant(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
+TYPE* signed_form(TYPE* t) {
+    return is_signed(t) ? t : t == tp->uint_t ? tp->int_t : t == tp->ulong_t ? tp->long_t : tp->llong_t;
+}
+
 // Tests against zero, and of one bit.
 NODE* test_against_zero(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
@@ -205,56 +224,16 @@ NODE* test_against_zero(NODE* t, struct LOOP* loop) {
         return simp_node(t, loop);
     }
     // (x & sign bit) != 0 of a signed x
-    if (is_node_with_icon(inner, ANDB) && is_signed(inner->type) && bits_of(inner->right) == sign_bit(inner->type)) {
+    if (is_node_with_icon(inner, ANDB) && bits_of(inner->right) == sign_bit(inner->type)) {
+        TYPE* type = signed_form(inner->type->stqs());
         t->op = t->op == EQ ? GE : LT;
         erase_node(inner->right);
-        t->left = take_left(inner);
-        return simp_node(t, loop);
-    }
-    // x << n == 0, x * odd == 0
-    if (is_node_with_icon(inner, MULT) && !(inner->right->u.lval & INT65(1)).is_zero()) {
-        erase_node(inner->right);
-        t->left = take_left(inner);
+        erase_node(t->right);
+        t->left = coerced(type, take_left(inner), loop);
+        t->right = mk_ICON(INT65(0), type);
         return simp_node(t, loop);
     }
     return nullptr;
-}
-
-// x * c rel 0 of a product that cannot wrap is the sign of c on x.
-NODE* sign_of_product(NODE* t, struct LOOP* loop) {
-    NODE* inner = t->left;
-    if (!is_icon(t->right, INT65(0)) || !is_node_with_icon(inner, MULT) || inner->right->u.lval.is_zero() ||
-        expr_product_may_overflow(inner, loop))
-        return nullptr;
-    if (inner->right->u.lval.is_negative()) t->op = commute_inv[t->op];
-    erase_node(inner->right);
-    t->left = take_left(inner);
-    return simp_node(t, loop);
-}
-
-// x / c == 0 and x >> n == 0 of an unsigned x, x >> n < 0 of a signed one.
-NODE* undo_division(NODE* t, struct LOOP* loop) {
-    NODE* inner = t->left;
-    if (!is_icon(t->right, INT65(0))) return nullptr;
-    const int n = inner->op == SRL ? shift_count_of(inner) : 0;
-    if (n && is_signed(inner->type) && (t->op == LT || t->op == GE)) {
-        erase_node(inner->right);
-        t->left = take_left(inner);
-        return simp_node(t, loop);
-    }
-    if (!is_equality(t) || is_signed(inner->type)) return nullptr;
-    INT65 divisor;
-    if (n)
-        divisor = INT65(1) << INT65(n);
-    else if (is_node_with_icon(inner, DIV) && !is_icon(inner->right, INT65(0)))
-        divisor = inner->right->u.lval;
-    else
-        return nullptr;
-    t->op = t->op == EQ ? ULT : UGE;
-    set_icon(t->right, divisor);
-    erase_node(inner->right);
-    t->left = take_left(inner);
-    return simp_node(t, loop);
 }
 
 // (c ? a : b) rel d of constants: the condition decides.
@@ -349,9 +328,10 @@ NODE* compare_uncast(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
-const RULE compare_rules[] = {decide,           compare_truth_value, order_at_the_end, move_constant_across,
-                              undo_on_constant, test_against_zero,   sign_of_product,  undo_division,
-                              compare_arms,     cancel_common_term,  undo_on_both,     compare_uncast};
+const RULE compare_rules[] = {
+    decide,           compare_truth_value, compare_single_bit, order_at_the_end, move_constant_across,
+    undo_on_constant, test_against_zero,   compare_computed,   compare_arms,     cancel_common_term,
+    undo_on_both,     compare_uncast};
 
 // ---- Pointers
 bool is_null(const NODE* t) {
@@ -392,13 +372,16 @@ void constant_to_the_right(NODE* t) {
 }
 
 // ---- Two compares under a bit operator
-// (x == 0) & (y == 0) is (x | y) == 0; (x < 0) & (y < 0) is (x & y) < 0; and the like. Other outcomes are the
-// opposites.
+// (x == 0) & (y == 0) is (x | y) == 0; (x == -1) & (y == -1) is (x & y) == -1; (x < 0) & (y < 0) is (x & y) < 0; and
+// the like. Other outcomes are the opposites.
 NODE* join_tests_of_zero(NODE* t, struct LOOP* loop) {
     NODE *a = t->left, *b = t->right;
-    if (a->op != b->op || !op_is_int_compare(a->op) || !is_icon(a->right, INT65(0)) || !is_icon(b->right, INT65(0)) ||
-        !same_integers(a->left->type, b->left->type) || !same_integers(a->left->type, a->right->type))
+    if (a->op != b->op || !op_is_int_compare(a->op) || !is_icon(a->right) || !is_icon(b->right) ||
+        !same_integers(a->left->type, b->left->type) || !same_integers(a->left->type, a->right->type) ||
+        !same_integers(b->left->type, b->right->type))
         return nullptr;
+    const bool all_ones = is_all_ones(a->right) && is_all_ones(b->right);
+    if (!all_ones && (!is_icon(a->right, INT65(0)) || !is_icon(b->right, INT65(0)))) return nullptr;
     const bool orders = a->op == LT || a->op == GE;
     if (orders && !is_signed(a->left->type)) return nullptr;
     int inner = 0;
@@ -406,6 +389,7 @@ NODE* join_tests_of_zero(NODE* t, struct LOOP* loop) {
     if (t->op == ORB && a->op == NEQ) inner = ORB;
     if (a->op == LT) inner = t->op;
     if (a->op == GE) inner = t->op == ANDB ? ORB : ANDB;
+    if (all_ones) inner = a->op == (t->op == ANDB ? EQ : NEQ) ? ANDB : 0;
     if (!inner) return nullptr;
     TYPE *operand = a->left->type->stqs(), *type = t->type;
     NODE* y = b->left;

@@ -4,8 +4,12 @@
 // are one compare where a mask or a range says it; two tests that are cheap and cannot trap are one operator on bits.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/compare.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
+
+#include <algorithm>
+#include <utility>
 
 using namespace rules;
 
@@ -48,117 +52,226 @@ bool strict_expr_allows_strict_expr(const NODE* a, const NODE* b) {
 }
 
 // ---- One value against two constants
+// What a test accepts of the value that it looks at: an interval, or all but one.
 struct TEST {
-    NODE* value; // null for no compare of an integer without effects with a constant
-    int op;
-    INT65 c;
+    NODE* value; // null for no test of an integer without effects against constants
+    INT65 low, high;
+    bool inside;
 };
+constexpr INT65 NONE = 0;
 
+// A number itself, as the control form has the test of what isn't zero.
+bool is_value_tested(const NODE* t) {
+    return (is_effective_leaf(t) || t->op == UMULT || t->op == STDOT) && is_integer(t->type) && !is_icon(t) &&
+           t->type->size >= tp->int_t->size && !is_bitfield_access(t) && is_pure(t);
+}
+
+// Which numbers of the type a test accepts.
 TEST test_of(NODE* t) {
+    const TEST no_test{nullptr, NONE, NONE, false};
+    if (is_value_tested(t)) return {t, NONE, NONE, false};
     const bool fits = op_is_int_compare(t->op) && is_icon(t->right) && same_integers(t->left->type, t->right->type) &&
-                      is_pure(t->left);
-    if (!fits) return {nullptr, 0, INT65(0)};
-    return {t->left, t->op, t->right->u.lval};
+                      t->left->type->size >= tp->int_t->size && is_pure(t->left);
+    if (!fits) return no_test;
+    TYPE* type = t->left->type;
+    const INT65 c = t->right->u.lval;
+    TEST test{t->left, int_type_min(type), int_type_max(type), t->op != NEQ};
+    if (t->op == EQ || t->op == NEQ) {
+        test.low = test.high = c;
+        return test;
+    }
+    if ((t->op >= ULE) != type->is_unsigned()) return no_test;
+    switch (t->op) {
+    case LT:
+    case ULT: test.high = c - INT65(1); break;
+    case LE:
+    case ULE: test.high = c; break;
+    case GT:
+    case UGT: test.low = c + INT65(1); break;
+    default: test.low = c; break;
+    }
+    return test;
+}
+
+// The same of the value below a difference or a mask that makes the test one of an interval: (unsigned)x - low < n,
+// (x & ~m) == c with ones at the low end of m alone.
+TEST test_of_inner_value(NODE* t) {
+    TEST test = test_of(t);
+    if (!test.value || test.low > test.high) return test;
+    NODE* inner = test.value;
+    test.value = nullptr;
+    TYPE* type = inner->type;
+    if (is_node_with_icon(inner, ANDB) && test.low == test.high) {
+        const uint64_t m = ~inner->right->u.lval.value & mask_of(type);
+        if ((m & (m + 1)) != 0 || (test.low.value & m) != 0 || m >= mask_of(type) >> 1) return test;
+        test.high = test.low + INT65(0, m);
+        test.value = inner->left;
+    } else if ((is_node_with_icon(inner, MINUS) || is_node_with_icon(inner, PLUS)) && !is_signed(type)) {
+        NODE* x = inner->left;
+        if (x->op == SCONV && is_integer(x->left->type) && x->left->type->size == type->size &&
+            !is_bitfield_access(x->left))
+            x = x->left;
+        const INT65 c = inner->right->u.lval, shift = inner->op == PLUS ? -c : c;
+        const INT65 low = truncate_to_type(test.low + shift, x->type), high = low + (test.high - test.low);
+        if (high > int_type_max(x->type)) return test;
+        test = {x, low, high, test.inside};
+    }
+    return test;
 }
 
 // x == c1 || x == c2 of constants that differ in one bit: (x & ~bit) == (c1 & c2).
 NODE* join_equalities(NODE* t, TEST a, TEST b, struct LOOP* loop) {
     const int wanted = t->op == OROR ? EQ : NEQ;
-    if (a.op != wanted || b.op != wanted) return nullptr;
+    if (t->left->op != wanted || t->right->op != wanted) return nullptr;
     TYPE* type = a.value->type->stqs();
-    const uint64_t bit = (a.c ^ b.c).value & mask_of(type);
+    const uint64_t bit = (a.low ^ b.low).value & mask_of(type);
     if (power_of_2(INT65(0, bit)) < 0) return nullptr;
     NODE* x = copy_tree(a.value);
     erase_tree(t);
     NODE* masked = made(ANDB, x, mk_ICON(~INT65(0, bit), type), type, loop);
-    return made(wanted, masked, mk_ICON(a.c & b.c, type), tp->int_t, loop);
+    return made(wanted, masked, mk_ICON(a.low & b.low, type), tp->int_t, loop);
 }
 
-// Which numbers of the type a compare accepts, as one interval; false for NEQ.
-bool interval_of(TEST t, INT65* low, INT65* high) {
-    TYPE* type = t.value->type;
-    *low = int_type_min(type);
-    *high = int_type_max(type);
-    switch (t.op) {
-    case EQ: *low = *high = t.c; return true;
-    case LT:
-    case ULT: *high = t.c - INT65(1); return true;
-    case LE:
-    case ULE: *high = t.c; return true;
-    case GT:
-    case UGT: *low = t.c + INT65(1); return true;
-    case GE:
-    case UGE: *low = t.c; return true;
-    default: return false;
+// What both tests accept where that is an interval or all but one; false where it is neither.
+bool intersect(TEST* a, TEST b, INT65 min, INT65 max) {
+    if (!a->inside && !b.inside) { // what neither excludes
+        if (a->low > a->high || b.low > b.high) return false;
+        const bool meet = std::max(a->low, b.low) <= std::min(a->high, b.high) + INT65(1);
+        if (meet) {
+            a->low = std::min(a->low, b.low);
+            a->high = std::max(a->high, b.high);
+            return true;
+        }
+        TEST &below = a->low < b.low ? *a : b, &above = a->low < b.low ? b : *a;
+        if (below.low > min || above.high < max) return false;
+        *a = {a->value, below.high + INT65(1), above.low - INT65(1), true};
+        return true;
     }
+    if (!a->inside) std::swap(*a, b);
+    if (b.inside) {
+        a->low = std::max(a->low, b.low);
+        a->high = std::min(a->high, b.high);
+        return true;
+    }
+    if (b.low > b.high || b.high < a->low || b.low > a->high) return true;
+    if (b.low <= a->low)
+        a->low = b.high + INT65(1);
+    else if (b.high >= a->high)
+        a->high = b.low - INT65(1);
+    else
+        return false;
+    return true;
 }
 
-NODE* within(NODE* x, INT65 low, INT65 high, bool inside, struct LOOP* loop) {
-    TYPE* type = x->type->stqs();
-    const INT65 min = int_type_min(type), max = int_type_max(type);
-    if (low > high) return truth(x, !inside);
-    if (low <= min && high >= max) return truth(x, inside);
-    const bool is_unsigned = type->is_unsigned();
-    auto relop = [&](int op, NODE* l, INT65 c) {
-        const bool unsigned_order = op >= LE && op <= GT && l->type->is_unsigned();
-        return made(unsigned_order ? op + (ULE - LE) : op, l, mk_ICON(c, l->type->stqs()), tp->int_t, loop);
-    };
-    if (low == high) return relop(inside ? EQ : NEQ, x, low);
-    if (low <= min) return relop(inside ? LE : GT, x, high);
-    if (high >= max) return relop(inside ? GE : LT, x, low);
-    // Below `low` the difference wraps to the top.
-    TYPE* wraps = is_unsigned ? type : tp->mk_unsigned(type);
-    NODE* from_low = made(MINUS, coerced(wraps, x, loop), mk_ICON(low, wraps), wraps, loop);
-    return relop(inside ? LT : GE, from_low, high - low + INT65(1));
-}
-
-// x >= low && x <= high, x < low || x > high, and all that is one interval or all but one.
+// x >= low && x <= high, x < low || x > high, x == c || x == c + 1, and all that is one interval or all but one.
 NODE* join_intervals(NODE* t, TEST a, TEST b, struct LOOP* loop) {
     const bool conjunction = t->op == ANDAND;
     if (!conjunction) { // the opposite of the conjunction of the opposites
-        a.op = boolean_inv[a.op];
-        b.op = boolean_inv[b.op];
+        a.inside = !a.inside;
+        b.inside = !b.inside;
     }
-    TYPE* type = a.value->type;
-    const INT65 min = int_type_min(type), max = int_type_max(type);
-    INT65 low_a, high_a, low_b, high_b;
-    bool of_a = interval_of(a, &low_a, &high_a), of_b = interval_of(b, &low_b, &high_b);
-    // x != c is an interval next to one that ends there.
-    auto without = [](INT65 c, INT65* low, INT65* high) {
-        if (c == *low)
-            *low = *low + INT65(1);
-        else if (c == *high)
-            *high = *high - INT65(1);
-        else
-            return c < *low || c > *high;
-        return true;
-    };
-    INT65 low, high;
-    if (of_a && of_b) {
-        low = low_a > low_b ? low_a : low_b;
-        high = high_a < high_b ? high_a : high_b;
-    } else if (of_a != of_b) {
-        low = of_a ? low_a : low_b;
-        high = of_a ? high_a : high_b;
-        if (!without(of_a ? b.c : a.c, &low, &high)) return nullptr;
-    } else {
-        low = min, high = max;
-        if (!without(a.c, &low, &high) || !without(b.c, &low, &high)) return nullptr;
-    }
-    NODE* x = copy_tree(a.value);
+    NODE* value = a.value;
+    if (!intersect(&a, b, int_type_min(value->type), int_type_max(value->type))) return nullptr;
+    NODE* x = copy_tree(value);
     erase_tree(t);
-    return within(x, low, high, conjunction, loop);
+    return compare_with_interval(x, a.low, a.high, a.inside == conjunction, loop);
+}
+
+bool test_one_value(TEST a, TEST b) {
+    return a.value && b.value && same_value(a.value, b.value) && same_integers(a.value->type, b.value->type) &&
+           is_pure(a.value);
+}
+
+// ---- Two compares of the same pair of values
+constexpr int LESS = 1, EQUAL = 2, GREATER = 4;
+
+int outcomes_of(int op) {
+    switch (op >= ULE ? op - (ULE - LE) : op) {
+    case EQ: return EQUAL;
+    case NEQ: return LESS | GREATER;
+    case LE: return LESS | EQUAL;
+    case LT: return LESS;
+    case GE: return EQUAL | GREATER;
+    default: return GREATER;
+    }
+}
+
+// x < y || x == y is x <= y; x <= y && y <= x is x == y.
+NODE* join_tests_of_one_pair(NODE* t, struct LOOP*) {
+    NODE *a = t->left, *b = t->right;
+    if (!op_is_int_compare(a->op) || !op_is_int_compare(b->op) || is_icon(a->right) || !is_pure(a)) return nullptr;
+    const bool crossed = !same_value(a->left, b->left);
+    if (!same_value(a->left, crossed ? b->right : b->left) || !same_value(a->right, crossed ? b->left : b->right))
+        return nullptr;
+    const int op_b = crossed ? commute_inv[b->op] : b->op;
+    auto is_equality = [](int op) { return op == EQ || op == NEQ; };
+    const int order = !is_equality(a->op) ? a->op : op_b; // where neither is an order, any
+    if (!is_equality(a->op) && !is_equality(op_b) && (a->op >= ULE) != (op_b >= ULE)) return nullptr;
+    const int x = outcomes_of(a->op), y = outcomes_of(op_b), both = t->op == ANDAND ? x & y : x | y;
+    if (both == 0 || both == (LESS | EQUAL | GREATER)) return replace_by(t, mk_ICON(INT65(both ? 1 : 0), tp->int_t));
+    for (int op : {EQ, NEQ, LE, LT, GE, GT}) {
+        if (outcomes_of(op) != both) continue;
+        a->op = op >= LE && order >= ULE ? op + (ULE - LE) : op;
+        TYPE* type = t->type;
+        erase_tree(b);
+        return coerce_to_type(type, simp_node(take_left(t), nullptr));
+    }
+    return nullptr;
+}
+
+// ---- Tests of bits of one value: (x & mask) == bits
+struct BITS_TEST {
+    NODE* value; // null for no such test
+    uint64_t mask, bits;
+};
+
+// As the condition itself, or as its opposite.
+BITS_TEST bits_test_of(NODE* t, bool opposite) {
+    const bool compares = (t->op == EQ || t->op == NEQ) && is_icon(t->right) && is_node_with_icon(t->left, ANDB) &&
+                          same_integers(t->left->type, t->right->type);
+    if (!compares && !is_node_with_icon(t, ANDB)) return {nullptr, 0, 0};
+    NODE* masked = compares ? t->left : t;
+    const uint64_t mask = bits_of(masked->right), bits = compares ? bits_of(t->right) : 0;
+    const bool equals = (compares && t->op == EQ) != opposite;
+    if (!is_pure(masked->left) || (bits & ~mask) != 0) return {nullptr, 0, 0};
+    if (equals) return {masked->left, mask, bits};
+    if ((mask & (mask - 1)) != 0) return {nullptr, 0, 0}; // only of a single bit the opposite is a value
+    return {masked->left, mask, bits ^ mask};
+}
+
+// x & 4 && !(x & 8) is (x & 12) == 4.
+NODE* join_tests_of_bits(NODE* t, struct LOOP* loop) {
+    const bool opposite = t->op == OROR;
+    const BITS_TEST a = bits_test_of(t->left, opposite), b = bits_test_of(t->right, opposite);
+    if (!a.value || !b.value || !same_value(a.value, b.value) || !same_integers(a.value->type, b.value->type))
+        return nullptr;
+    if ((a.bits ^ b.bits) & a.mask & b.mask) return replace_by(t, mk_ICON(INT65(opposite ? 1 : 0), tp->int_t));
+    TYPE *type = a.value->type->stqs(), *result = t->type;
+    auto constant = [&](uint64_t bits) {
+        NODE* c = mk_ICON(INT65(0), type);
+        set_icon(c, INT65(0, bits));
+        return c;
+    };
+    NODE *mask = constant(a.mask | b.mask), *bits = constant(a.bits | b.bits), *x = copy_tree(a.value);
+    erase_tree(t);
+    NODE* masked = made(ANDB, x, mask, type, loop);
+    return coerce_to_type(result, made(opposite ? NEQ : EQ, masked, bits, tp->int_t, loop));
 }
 
 NODE* join_tests_of_one_value(NODE* t, struct LOOP* loop) {
     const TEST a = test_of(t->left), b = test_of(t->right);
-    if (!a.value || !b.value || !same_value(a.value, b.value) || !same_integers(a.value->type, b.value->type))
-        return nullptr;
-    if (a.value->type->size < tp->int_t->size) return nullptr;
-    auto order_fits = [](TEST x) { return x.op == EQ || x.op == NEQ || (x.op >= ULE) == x.value->type->is_unsigned(); };
-    if (!order_fits(a) || !order_fits(b)) return nullptr;
-    if (NODE* r = join_equalities(t, a, b, loop)) return r;
-    return join_intervals(t, a, b, loop);
+    if (test_one_value(a, b)) {
+        if (NODE* r = join_equalities(t, a, b, loop)) return r;
+        if (NODE* r = join_intervals(t, a, b, loop)) return r;
+    }
+    if (NODE* r = join_tests_of_one_pair(t, loop)) return r;
+    if (NODE* r = join_tests_of_bits(t, loop)) return r;
+    if (!a.value || !b.value) return nullptr;
+    const TEST inner_a = test_of_inner_value(t->left), inner_b = test_of_inner_value(t->right);
+    for (const auto& [x, y] : {std::pair(inner_a, b), std::pair(a, inner_b), std::pair(inner_a, inner_b)})
+        if (test_one_value(x, y))
+            if (NODE* r = join_intervals(t, x, y, loop)) return r;
+    return nullptr;
 }
 
 // ---- Forms without a branch
@@ -167,11 +280,13 @@ bool find_or_make_safe_for_ANDB(const NODE* a, const NODE* b) {
     return returns_1_or_0(a) && returns_1_or_0(b) && strict_expr_allows_strict_expr(a, b);
 }
 
-// Two truth values at hand, or two tests of zero that are one: & and | of them.
+// Two truth values at hand, or two tests of no or all bits that are one: & and | of them.
 NODE* simp_strict_operands(NODE* t, struct LOOP* loop) {
     if (!find_or_make_safe_for_ANDB(t->left, t->right)) return nullptr;
     auto is_leaf = [](const NODE* n) { return is_effective_leaf(n) || n->op == STDOT; };
-    auto tests_zero = [](const NODE* n) { return op_is_int_compare(n->op) && is_icon(n->right, INT65(0)); };
+    auto tests_end = [](const NODE* n) {
+        return op_is_int_compare(n->op) && (is_icon(n->right, INT65(0)) || is_all_ones(n->right));
+    };
     if (is_leaf(t->left) && is_leaf(t->right)) {
         TYPE* type = t->type;
         t->left = coerced(tp->int_t, t->left, loop);
@@ -180,7 +295,7 @@ NODE* simp_strict_operands(NODE* t, struct LOOP* loop) {
         t->type = tp->int_t;
         return coerce_to_type(type, simp_node(t, loop));
     }
-    if (!tests_zero(t->left) || !tests_zero(t->right) || !is_effective_leaf(t->left->left) ||
+    if (!tests_end(t->left) || !tests_end(t->right) || !is_effective_leaf(t->left->left) ||
         !is_effective_leaf(t->right->left))
         return nullptr;
     const int op = t->op;
@@ -193,7 +308,7 @@ NODE* simp_strict_operands(NODE* t, struct LOOP* loop) {
 // (a || b) || c where c tests the same value as one of the others: joined there. That value is computed before c in any
 // case, and what is passed over, which is then asked only if both say nothing, must have no effects.
 NODE* join_within_chain(NODE* t, struct LOOP* loop) {
-    if (!test_of(t->right).value) return nullptr;
+    if (!test_of(t->right).value && !bits_test_of(t->right, false).value) return nullptr;
     NODE* chain = t->left;
     for (int i = 0; i < andor_andor_height && chain->op == t->op; ++i, chain = chain->left) {
         NODE** links[] = {&chain->right, chain->left->op == t->op ? nullptr : &chain->left};

@@ -275,6 +275,18 @@ INT65 max_ICON_delta(const NODE* tree, struct LOOP* loop) {
     return f ? INT65(0, f) : greatest_power(tree->type);
 }
 
+namespace {
+
+// Of x % c, and of x & c by the power of two that the ones at the low end of c leave, else 0.
+WIDE modulus_of(const NODE* t) {
+    if (!t->right || t->right->op != ICON) return 0;
+    const INT65 c = t->right->u.lval;
+    if (t->op == MOD) return to_wide(c);
+    return t->op == ANDB && ~c.value ? WIDE(~c.value & (c.value + 1)) : 0;
+}
+
+} // namespace
+
 INT65 expr_modulo_constant(const NODE* tree, TYPE* type, INT65 value, struct LOOP* loop) {
     if (!is_number_type(tree->type) || !is_number_type(type) || value <= INT65(0)) return -1;
     const WIDE m = to_wide(value);
@@ -290,8 +302,8 @@ INT65 expr_modulo_constant(const NODE* tree, TYPE* type, INT65 value, struct LOO
     INT65 found = -1;
     for_each_given(loop, [&](const NODE* fact, bool holds) {
         const bool equals = (fact->op == EQ && holds) || (fact->op == NEQ && !holds);
-        if (!equals || fact->right->op != ICON || fact->left->op != MOD || fact->left->right->op != ICON) return;
-        const WIDE modulus = to_wide(fact->left->right->u.lval);
+        if (!equals || fact->right->op != ICON) return;
+        const WIDE modulus = modulus_of(fact->left);
         if (modulus == 0 || modulus % m != 0 || !is_same_value(fact->left->left, tree)) return;
         if (keeps_value || survives_wraps) found = residue(to_wide(fact->right->u.lval));
     });

@@ -133,6 +133,14 @@ bool object_symbols_may_alias(const SYMTAB* a, const SYMTAB* b) {
     return parm->level == 1 && local->level == 2 && map_sym_to_parm(local) == parm;
 }
 
+// Objects of different types that lie over each other in the variable that disjoint scopes share: what is accessed as
+// one type is accessed as another before or after.
+static bool may_share_stack(TYPE* a, TYPE* b) {
+    const SYMTAB* shared = currfuninfo ? currfuninfo->stack_union : nullptr;
+    return shared && may_be_reached_by_pointers(shared) && type_may_access_part_of(a, shared->type) &&
+           type_may_access_part_of(b, shared->type);
+}
+
 bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, bool by_type, bool* unsure) {
     a = without_wrappers(a);
     b = without_wrappers(b);
@@ -159,7 +167,7 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     if (by_type) {
         bool exact_a, exact_b;
         TYPE *type_a = true_type(a, &exact_a), *type_b = true_type(b, &exact_b);
-        if (!types_may_be_aliased(type_a, exact_a, type_b, exact_b)) return false;
+        if (!types_may_be_aliased(type_a, exact_a, type_b, exact_b) && !may_share_stack(type_a, type_b)) return false;
     }
     if (loop && p && q && build_the_umults_alias_free_by_predication_lists(a, b, loop)) return false;
     if (unsure) *unsure = true;

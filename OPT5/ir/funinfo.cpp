@@ -300,6 +300,7 @@ void erase_all() {
     for (SYMTAB** list : {&f->new_syms, &f->pending_syms, &f->memory_syms, &f->scalar_syms}) erase_symbols(*list);
     for (SYMTAB* sym : f->dropped_syms) delete sym;
     f->dropped_syms.clear();
+    f->stack_union = nullptr;
     erase_ranges(f->widened);
     erase_ranges(f->shortened);
     erase_symlist(f->fl_statics);

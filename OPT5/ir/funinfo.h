@@ -129,6 +129,7 @@ public:
     std::unique_ptr<SPMAP> spmap; // what pointer variables point into; never null
     std::unique_ptr<SNMAP> snmap; // the values in force during constant propagation; never null
     OVERLAP* overlaps = nullptr;
+    SYMTAB* stack_union = nullptr; // the variable that locals of disjoint scopes lie in over each other, or null
     uint32_t name_counter = 0;
     bool address_taken_local = false, has_bitfield_access = false, has_cqual10_name = false;
     bool no_calls = true; // no CALL or UCALL was made in this function

@@ -46,6 +46,8 @@ bool csu_type_has_only_simple_scalar_members(TYPE* t, int limit);
 bool type_is_contained_in_type(TYPE* part, TYPE* whole);
 bool types_contained_in_union(TYPE* a, TYPE* b);
 bool type_may_alias_type(TYPE* a, TYPE* b);
+// Whether an access of that type may be one to a part of an object of type `whole`.
+bool type_may_access_part_of(TYPE* access, TYPE* whole);
 bool type_may_contain_volatile(TYPE* t);
 bool type_could_be_an_array(TYPE* t);
 TYPE* type_of_nth_parameter(int n, const SYMTAB* sym); // null beyond the prototype

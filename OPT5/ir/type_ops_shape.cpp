@@ -146,6 +146,17 @@ bool type_may_alias_type(TYPE* a, TYPE* b) {
     });
 }
 
+bool type_may_access_part_of(TYPE* access, TYPE* whole) {
+    access = bare(access);
+    if (access->is_void() || (access->is_csu() && !access->is_complete())) return true;
+    if (access->is_int() && access->size <= tp->int_t->size) return true; // a character is no wider
+    if (is_type_component_of_type(access, whole)) return true;
+    if (!access->is_int() && !access->is_enum()) return false;
+    TYPE* signed_form = essential_type(access);
+    return is_type_component_of_type(signed_form, whole) ||
+           is_type_component_of_type(tp->mk_unsigned(signed_form), whole);
+}
+
 bool type_may_contain_volatile(TYPE* t) {
     if (t->is_volatile()) return true;
     return any_component(t, [](TYPE* c) {

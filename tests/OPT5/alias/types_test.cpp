@@ -93,4 +93,19 @@ TEST_F(Types, AccessesThroughPointers) {
     (void)pv;
 }
 
+// What lies over each other in the variable that scopes share is accessed by both types in turn.
+TEST_F(Types, SharedStack) {
+    SYMTAB* shared = local("shared", make_union("shared", tp->long_t, tp->float_t));
+    SYMTAB *l = local("l", ptr(tp->ulong_t)), *f = local("f", ptr(tp->float_t)), *w = local("w", ptr(tp->llong_t));
+    add(call_of(function("_unknown"), address(name(shared))));
+    analyze();
+    EXPECT_FALSE(may_meet(deref(name(l)), deref(name(f))));
+    currfuninfo->stack_union = shared;
+    EXPECT_TRUE(may_meet(deref(name(l)), deref(name(f))));
+    EXPECT_FALSE(may_meet(deref(name(l)), deref(name(w)))); // no part of it
+    shared->set_is_aliased(false);
+    EXPECT_FALSE(may_meet(deref(name(l)), deref(name(f))));
+    currfuninfo->stack_union = nullptr;
+}
+
 } // namespace

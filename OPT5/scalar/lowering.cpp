@@ -6,7 +6,6 @@ int GO_FOR_INSTRUMENTATION = 0;
 
 void expand_bitfields() {}
 void convert_sti_to_cinit() {}
-void subst_csu_returning_temp_for_local_var() {}
 void expand_cluster_refs() {}
 void collect_clustered_symbols() {}
 void add_instrumentation_exit_routine_to_atexit() {}

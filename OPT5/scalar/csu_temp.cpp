@@ -1,0 +1,133 @@
+// A function that returns a structure through a hidden pointer, and fills a local that every path copies to where that
+// points, fills the place itself.
+//
+// The place is an object of the caller that nothing else names before the function returns: what the local is given, it
+// may be given at once. The pointer is used for nothing but those copies, so that no access through it stands between
+// them and the accesses of the local; and no copy is followed by anything that could still change the local.
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/lowering.h"
+
+#include <unordered_set>
+#include <vector>
+
+namespace {
+
+class SUBSTITUTION {
+public:
+    explicit SUBSTITUTION(SYMTAB* pointer) : hidden(pointer) {}
+    void run() {
+        if (!find_copies() || !may_go() || count_uses() != copies) return;
+        if (print_debug) {
+            debug_printf("\nsubst_csu_returning_temp_for_local_var()\n  is substituting *%s\n", hidden->name);
+            debug_printf("    for local var  %s\n\n", local->name);
+        }
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (LIST** link = &bb->statements; *link;) link = rewrite_statement(link);
+        unlink_symbol(local, &currfuninfo->memory_syms);
+        currfuninfo->dropped_syms.push_back(local);
+    }
+
+private:
+    bool is_copy(const NODE* t) const {
+        if (t->op != STASG || t->left->op != UMULT || t->left->right || t->right->op != NAME) return false;
+        const NODE* pointer = t->left->left;
+        return pointer->op == NAME && pointer->u.sym == hidden && (!local || t->right->u.sym == local);
+    }
+
+    // The block leaves the function; its last act must be a copy of the one local.
+    bool ends_in_copy(const BBLK* bb) {
+        const LIST* before = nullptr;
+        for (const LIST* s = bb->statements; s && s->rest; s = s->rest) before = s;
+        if (!before || !is_copy(before->first)) return false;
+        local = before->first->right->u.sym;
+        ++copies;
+        return true;
+    }
+
+    // Backwards from the exit through blocks that do nothing.
+    bool find_copies() {
+        const BBLK* exit = currfuninfo->exit_bb;
+        if (!exit || !exit->branch() || exit->branch()->op != URETURN) return false;
+        std::vector<const BBLK*> ways = {exit};
+        std::unordered_set<const BBLK*> seen = {exit};
+        while (!ways.empty()) {
+            const BBLK* bb = ways.back();
+            ways.pop_back();
+            if (bb != exit && bb->branch()->op != BRANCH) return false;
+            if (bb->statements->rest) {
+                if (!ends_in_copy(bb)) return false;
+                continue;
+            }
+            if (!bb->predecessors) return false;
+            for (const EDGE* e = bb->predecessors; e; e = e->rest)
+                if (seen.insert(e->first).second) ways.push_back(e->first);
+        }
+        return copies > 0;
+    }
+
+    bool may_go() const {
+        if (local->level != 2 || local->sclass != SC_AUTO || !symbol_in_list(local, currfuninfo->memory_syms))
+            return false;
+        if (!hidden->type->is_pointer() || !exact_types(local->type->stqs(), hidden->type->type_pointed_to()->stqs()))
+            return false;
+        return !type_may_contain_volatile(local->type) && !local->pragma && !sym_appears_in_EHT(local) &&
+               local->align <= local->type->align; // the caller's object has what its type asks for
+    }
+
+    int count_uses() const {
+        int uses = 0;
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (const LIST* s = bb->statements; s; s = s->rest) {
+                if (tree_is_arg_prolog(s->first) || s->first->op == NASSERT) continue;
+                if (s->first->op == RETURN || calls_setjmp(s->first)) return -1;
+                for_each_node(s->first, [&](const NODE* t) { uses += t->op == NAME && t->u.sym == hidden; });
+            }
+        return uses;
+    }
+
+    NODE* place(const NODE* name) const {
+        return maketree(UMULT, mk_NAME(hidden, name->ls), nullptr, name->type, name->ls);
+    }
+
+    NODE* substitute(NODE* t) const {
+        if (t->op == UAND && t->left->op == UMULT && !t->left->right && t->left->left->op == NAME &&
+            t->left->left->u.sym == hidden) {
+            NODE* pointer = coerce_to_type(t->type, t->left->left);
+            erase_node(t->left);
+            erase_node(t);
+            return pointer;
+        }
+        if (t->op != NAME || t->u.sym != local) return t;
+        NODE* r = place(t);
+        erase_tree(t);
+        return r;
+    }
+
+    LIST** rewrite_statement(LIST** link) const {
+        LIST* s = *link;
+        if (is_copy(s->first)) {
+            *link = s->rest;
+            erase_tree(s->first);
+            delete s;
+            return link;
+        }
+        s->first = rewrite_tree(s->first, [this](NODE* t) { return substitute(t); });
+        return &s->rest;
+    }
+
+    SYMTAB* hidden;
+    SYMTAB* local = nullptr;
+    int copies = 0;
+};
+
+} // namespace
+
+void subst_csu_returning_temp_for_local_var() {
+    FUNINFO* f = currfuninfo;
+    SYMTAB* hidden = f->csu_return_sym ? f->csu_return_sym : f->ret_by_cctor_sym;
+    if (hidden && f->bb_list) SUBSTITUTION(hidden).run();
+}

@@ -1,10 +1,20 @@
-// Parts of objects within a block: a store that a later store covers before anything reads it goes, and a load of a
-// part whose value a variable or a constant is known to hold takes that.
+// Stores that nothing reads: of a part that a later store covers first, and into objects of the frame that are not read
+// any more.
 //
-// Facts begin and end with the block. Whether an access between may meet a part is left to the alias rules.
+// Of two stores with the same address and nothing in between that may read what the second writes, the first is dead.
+// Within a block a walk from the last statement to the first keeps the stores that wait for such an earlier one; a
+// bounded number of them keeps long blocks linear. What an access may meet is left to the alias rules, and since they
+// judge by types too, the first store must be one that a read of the second's type could not miss.
+//
+// Structures and arrays of the frame that only their own name can reach have a life like that of a variable, which
+// spans blocks: a backward analysis with a bit for each. A store to any part of one that is dead behind it goes.
 
+#include "OPT5/scalar/subrange.h"
+
+#include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -13,235 +23,270 @@
 #include "OPT5/simp/simp.h"
 
 #include <algorithm>
-#include <optional>
+#include <unordered_map>
 #include <vector>
+
+// ---- Places
 
 namespace {
 
-constexpr std::size_t MOST_KNOWN = 32; // facts at a time, which keeps long blocks linear
+constexpr int MOST_NODES = 48; // of an lvalue that facts are kept on
 
-// Bits `offset` to `offset + size` of the object that `base` names or, where it is no NAME, points to.
-struct SUBRANGE {
-    const NODE* lvalue; // borrowed from its statement
-    const NODE* base;
-    int64_t size;
-    int64_t offset;
-
-    bool is_named() const { return base->op == NAME && !is_through_pointer; }
-    bool is_through_pointer = false;
-};
-
-std::optional<SUBRANGE> compute_subrange(const NODE* lvalue) {
-    int64_t offset = 0, size = static_cast<int64_t>(lvalue->type->size);
-    const NODE* t = lvalue;
-    for (; t->op == STDOT || t->op == STREF; t = t->left) {
-        const fkMDATA* member = t->right->op == FIELD ? t->right->mval : nullptr;
-        if (!member) return std::nullopt;
-        if (t == lvalue && member->is_bitfld) size = member->width;
-        offset += member->offset;
-        if (t->op == STREF) return SUBRANGE{lvalue, t->left, size, offset, true};
-    }
-    if (t->op == UMULT) return SUBRANGE{lvalue, t->left, size, offset, true};
-    if (t->op == NAME) return SUBRANGE{lvalue, t, size, offset, false};
-    return std::nullopt;
+bool have_same_base(const ADDRESS_FORM& a, const ADDRESS_FORM& b) {
+    if (a.object != b.object || a.terms.size() != b.terms.size()) return false;
+    return std::all_of(a.terms.begin(), a.terms.end(), [&b](const ADDRESS_TERM& x) {
+        return std::any_of(b.terms.begin(), b.terms.end(), [&x](const ADDRESS_TERM& y) {
+            return x.coefficient == y.coefficient && trees_are_congruent(x.tree, y.tree, false);
+        });
+    });
 }
 
-// Whether a store to `later` leaves nothing of a store to `s`. Through pointers only in the same type: the alias rules
-// do not take a read in another type for one of `later`.
+} // namespace
+
+const NODE* get_first_non_stdot_node_down_the_left_side_of_tree(const NODE* t) {
+    while (t && t->op == STDOT) t = t->left;
+    return t;
+}
+
+bool is_plain_assignment(const NODE* t) { return t->op == ASG || t->op == STASG || t->op == ARASG; }
+
+bool is_operator_assignment(const NODE* t) {
+    return t->op == PLUSPLUS || t->op == MINMIN || op_of_opASG[t->op] != ILLOP;
+}
+
+bool compute_subrange(const NODE* lvalue, SUBRANGE* s) {
+    const NODE* object = get_first_non_stdot_node_down_the_left_side_of_tree(lvalue);
+    if (object->op != NAME && object->op != UMULT && object->op != STREF) return false;
+    if (tree_has_side_effects(lvalue)) return false; // a volatile access is one
+    if (count_nodes_in_tree(lvalue) > MOST_NODES) return false;
+    *s = {lvalue, address_form(lvalue)};
+    return s->place.width > INT65(0);
+}
+
 bool covers(const SUBRANGE& later, const SUBRANGE& s) {
-    if (s.size <= 0 || s.offset < later.offset || s.offset + s.size > later.offset + later.size) return false;
-    if (later.is_named() && s.is_named()) return later.base->u.sym == s.base->u.sym;
-    return later.is_through_pointer && s.is_through_pointer && equiv_mtypes(later.lvalue->type, s.lvalue->type) &&
-           trees_are_congruent(later.base, s.base, false);
+    const ADDRESS_FORM &l = later.place, &e = s.place;
+    if (e.offset < l.offset || e.offset + e.width > l.offset + l.width || !have_same_base(l, e)) return false;
+    if (l.object && l.terms.empty()) return true;
+    TYPE *whole = later.lvalue->type, *part = s.lvalue->type;
+    return equiv_mtypes(whole, part) || (whole->is_csu() && is_type_component_of_type(part, whole));
 }
 
-bool is_plain_assignment(const NODE* t) { return t->op == ASG || t->op == STASG; }
-
-bool may_be_replaced(const NODE* t) {
-    return is_plain_assignment(t) && !tree_is_arg_prolog(t) && !lvalue_is_volatile(t->left) &&
-           !tree_has_side_effects(t->left);
+bool address_is_changed_by(const NODE* t, const SUBRANGE& s) {
+    const auto& terms = s.place.terms;
+    return std::any_of(terms.begin(), terms.end(),
+                       [t](const ADDRESS_TERM& x) { return tree_modifies_lvalue_in_tree(t, x.tree); });
 }
+
+namespace {
+
+// ---- The lives of objects
+
+// The NAME of the object that an lvalue is part of, where the tree shows it.
+const NODE* object_of(const NODE* t) {
+    bool is_pointer = false; // `t` is an address, not a place
+    for (;;) switch (t->op) {
+        case NAME: return is_pointer ? nullptr : t;
+        case STDOT:
+        case UAND:
+            if (is_pointer != (t->op == UAND)) return nullptr;
+            is_pointer = false;
+            t = t->left;
+            break;
+        case STREF:
+        case UMULT:
+            if (is_pointer) return nullptr;
+            is_pointer = true;
+            t = t->left;
+            break;
+        case PCONV:
+        case ISP2CHAR:
+        case OUIALIGN:
+        case NONALIGN:
+        case IDENTITY: t = t->left; break;
+        case PLUS:
+        case MINUS: t = t->left->type->is_pointer() ? t->left : t->right; break;
+        default: return nullptr;
+        }
+}
+
+class OBJECT_LIVES {
+public:
+    OBJECT_LIVES() {
+        const FUNINFO* f = currfuninfo;
+        for (SYMTAB* list : {f->new_syms, f->pending_syms, f->memory_syms, f->scalar_syms})
+            for (SYMTAB* sym = list; sym; sym = sym->next)
+                if (is_candidate(sym)) bit_of.emplace(sym, static_cast<uint32_t>(bit_of.size()));
+        if (!bit_of.empty()) find_lives();
+    }
+
+    bool empty() const { return bit_of.empty(); }
+
+    // What is live behind the block.
+    BITVEC at_exit(const BBLK* bb) const {
+        BITVEC set = none();
+        if (empty()) return set;
+        for (const EDGE* e = bb->successors; e; e = e->rest) set |= at_entry[static_cast<size_t>(e->first->dfn)];
+        return set;
+    }
+
+    bool is_dead_target(const NODE* lvalue, const BITVEC& live) const {
+        const int bit = bit_of_target(lvalue);
+        return bit >= 0 && !live.test(static_cast<uint32_t>(bit)) && !tree_has_side_effects(lvalue);
+    }
+
+    // From behind a statement to in front of it. `completes`: nothing leaves it in its middle.
+    void pass(NODE* t, BITVEC& live, bool completes) const {
+        const NODE* target = nullptr;
+        if (is_plain_assignment(t) && bit_of_target(t->left) >= 0) {
+            target = object_of(t->left);
+            if (target == t->left && completes) live.clear(bit_of.at(target->u.sym));
+        }
+        for_each_node(t, [&](const NODE* n) {
+            if (n->op != NAME || n == target) return;
+            if (auto it = bit_of.find(n->u.sym); it != bit_of.end()) live.set(it->second);
+        });
+    }
+
+private:
+    static bool is_candidate(const SYMTAB* sym) {
+        const FUNINFO* f = currfuninfo;
+        if (sym->level != 2 || (sym->sclass != SC_AUTO && sym->sclass != SC_REGISTER && sym->sclass != SC_REGISTER2))
+            return false;
+        if (!sym->type->is_csu() && !sym->type->is_array()) return false;
+        if (sym->is_aliased() || sym->lives_in_others || sym->hosts_others || sym->type->is_volatile()) return false;
+        if (sym == f->csu_return_sym || sym == f->ret_by_cctor_sym) return false;
+        return !f->has_eh() || !sym_appears_in_EHT(sym);
+    }
+
+    int bit_of_target(const NODE* lvalue) const {
+        const NODE* object = object_of(lvalue);
+        auto it = object ? bit_of.find(object->u.sym) : bit_of.end();
+        return it != bit_of.end() ? static_cast<int>(it->second) : -1;
+    }
+
+    BITVEC none() const { return BITVEC(static_cast<uint32_t>(bit_of.size())); }
+
+    // In front of a block lives what it reads, and of what lives behind it that which would also reach its start.
+    void find_lives() {
+        renumber_bblocks();
+        const size_t n = static_cast<size_t>(currfuninfo->bb_count) + 1;
+        std::vector<BITVEC> through(n, none());
+        at_entry.assign(n, none());
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            BITVEC &read = at_entry[static_cast<size_t>(bb->dfn)], &passed = through[static_cast<size_t>(bb->dfn)];
+            passed.set_all();
+            for_each_statement_backward(bb, [&](NODE*& t, bool completes) {
+                pass(t, read, completes);
+                pass(t, passed, completes);
+            });
+        }
+        BBLK* const entry = currfuninfo->bb_list;
+        for (bool again = true; again;) {
+            again = false;
+            for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) {
+                BITVEC& known = at_entry[static_cast<size_t>(bb->dfn)];
+                BITVEC live = at_exit(bb);
+                live &= through[static_cast<size_t>(bb->dfn)];
+                live |= known;
+                if (live == known) continue;
+                known = live;
+                again = true;
+            }
+        }
+    }
+
+    std::unordered_map<const SYMTAB*, uint32_t> bit_of; // looked up, never walked
+    std::vector<BITVEC> at_entry;                       // by depth-first number
+
+public:
+    template <class F>
+    static void for_each_statement_backward(BBLK* bb, const F& visit) {
+        std::vector<LIST*> cells;
+        for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
+        bool completes = true;
+        for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
+            const bool is_dispatch = tree_is_EH_SWITCH((*it)->first);
+            visit((*it)->first, completes);
+            completes = !is_dispatch; // the statement in front of a dispatch may be left in its middle
+        }
+    }
+};
 
 // ---- Dead stores
 
 class DEAD_STORES {
 public:
     void run(BBLK* bb) {
-        std::vector<LIST*> cells;
-        for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
-        bool completes = true, dropped = false; // nothing leaves the statement in its middle
-        for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
-            NODE*& t = (*it)->first;
-            const bool is_dispatch = tree_is_EH_SWITCH(t);
-            std::optional<SUBRANGE> target;
-            if (may_be_replaced(t)) target = compute_subrange(t->left);
-            if (target && is_covered(*target)) {
-                remove(t);
-                target.reset();
-                dropped |= !t;
+        live = objects.at_exit(bb);
+        bool dropped = false;
+        OBJECT_LIVES::for_each_statement_backward(bb, [&](NODE*& t, bool completes) {
+            bool is_cover = false;
+            SUBRANGE target;
+            if (is_plain_assignment(t) || is_operator_assignment(t)) {
+                const bool is_known = !tree_is_arg_prolog(t) && compute_subrange(t->left, &target);
+                if (objects.is_dead_target(t->left, live) || (is_known && is_covered(target)))
+                    remove(t);
+                else
+                    is_cover = is_known && completes && is_plain_assignment(t);
+            }
+            if (!t) {
+                dropped = true;
+                return;
+            }
+            if (!objects.empty()) objects.pass(t, live, completes);
+            if (is_cover) {
+                if (overwritten.size() == MOST_COVERS) overwritten.erase(overwritten.begin());
+                overwritten.push_back(target);
             }
             // What the store itself takes counts as read in front of it.
-            if (target && completes) {
-                if (overwritten.size() == MOST_KNOWN) overwritten.erase(overwritten.begin());
-                overwritten.push_back(*target);
-            }
-            if (t) note_accesses(t, target);
-            completes = !is_dispatch;
-        }
+            kill_aliased_subranges(t, is_cover);
+        });
         overwritten.clear();
         if (dropped) drop_empty_cells(&bb->statements);
     }
 
 private:
+    static constexpr size_t MOST_COVERS = 32;
+
     bool is_covered(const SUBRANGE& s) const {
-        return std::any_of(overwritten.begin(), overwritten.end(), [&](const SUBRANGE& o) { return covers(o, s); });
+        return std::any_of(overwritten.begin(), overwritten.end(), [&s](const SUBRANGE& o) { return covers(o, s); });
     }
 
+    // The effects of what would have been stored stay.
     void remove(NODE*& t) {
-        NODE* effect = t->right;
-        const bool has_effect = tree_has_side_effects(effect);
+        const bool has_effect = t->right && tree_has_side_effects(t->right);
         if (print_debug)
-            debug_printf("\n(%ld) DEAD ASSIGNMENT (edsa_ASG):  %s, Effect? %d\n", ++count, stmt2infix(t).c_str(),
-                         has_effect);
+            debug_printf(is_plain_assignment(t) ? "\n(%ld) DEAD ASSIGNMENT (edsa_ASG):  %s, Effect? %d\n"
+                                                : "\n(%ld) DEAD ASSIGNMENT (edsa_opASG) : %s, Effect? %d\n",
+                         ++count, stmt2infix(t).c_str(), has_effect);
+        NODE* effect = t->right;
         t->right = nullptr;
         erase_tree(t);
-        t = peel_for_effect(effect);
+        t = effect ? peel_for_effect(effect) : nullptr;
     }
 
-    // What the statement may read, and places that it moves, are not known to be overwritten first any more.
-    void note_accesses(const NODE* t, const std::optional<SUBRANGE>& target) {
+    // What the statement may read, and places that it moves, are not known to be overwritten first any more. The place
+    // that a plain assignment writes is no read.
+    void kill_aliased_subranges(const NODE* t, bool is_plain_store) {
+        const NODE* place = is_plain_store ? get_first_non_stdot_node_down_the_left_side_of_tree(t->left) : nullptr;
         auto ends = [&](const SUBRANGE& s) {
-            if (tree_modifies_lvalue_in_tree(t, s.base) && s.is_through_pointer) return true;
-            if (!target) return tree_touches_lvalue(t, s.lvalue);
-            const NODE* lhs = t->left;
-            while (lhs->op == STDOT) lhs = lhs->left;
-            return tree_touches_lvalue(t->right, s.lvalue) ||
-                   (lhs->op != NAME && tree_touches_lvalue(lhs->left, s.lvalue));
+            if (address_is_changed_by(t, s)) return true;
+            if (!place) return tree_touches_lvalue(t, s.lvalue);
+            if (tree_touches_lvalue(t->right, s.lvalue)) return true;
+            if (place->op == NAME) return false;
+            return tree_touches_lvalue(place->left, s.lvalue) ||
+                   (place->op == UMULT && place->right && tree_touches_lvalue(place->right, s.lvalue));
         };
         overwritten.erase(std::remove_if(overwritten.begin(), overwritten.end(), ends), overwritten.end());
     }
 
+    const OBJECT_LIVES objects;
+    BITVEC live;
     std::vector<SUBRANGE> overwritten; // later in the block, and not read up to there
     long count = 0;
 };
 
-// ---- Known values
-
-struct KNOWN {
-    NODE* lvalue; // both are copies
-    NODE* value;
-};
-
-bool is_whole_scalar(const NODE* lvalue) {
-    if (!lvalue->type->is_scalar() || lvalue->type->is_complex()) return false;
-    if (lvalue->op == UMULT) return true;
-    if (lvalue->op != STDOT && lvalue->op != STREF) return false;
-    return lvalue->right->op == FIELD && lvalue->right->mval && !lvalue->right->mval->is_bitfld;
-}
-
-bool is_private_variable(const NODE* t) {
-    return t->op == NAME && t->u.sym->level == 2 && !t->u.sym->is_aliased() && t->type->is_scalar() &&
-           !lvalue_is_volatile(t);
-}
-
-class KNOWN_VALUES {
-public:
-    ~KNOWN_VALUES() { forget_all(); }
-
-    void run(BBLK* bb) {
-        for (LIST* s = bb->statements; s; s = s->rest) {
-            NODE* t = s->first;
-            if (!known.empty()) reuse(t);
-            forget_modified(t);
-            learn(t);
-        }
-        forget_all();
-    }
-
-private:
-    // Only parts that are evaluated before the statement changes anything: both sides of an assignment, or all of it.
-    void reuse(NODE*& t) {
-        if (tree_contains_op(t, ASM) || tree_is_arg_prolog(t)) return;
-        if (!is_plain_assignment(t)) return;
-        if (tree_has_side_effects(t->left) || tree_has_side_effects(t->right)) return;
-        const NODE* before = t->right;
-        t->right = reuse_in(t->right);
-        if (t->right != before) t->right = coerce_to_type(t->left->type, t->right);
-        NODE* lhs = t->left;
-        while (lhs->op == STDOT) lhs = lhs->left;
-        if (lhs->op == UMULT || lhs->op == STREF) lhs->left = reuse_in(lhs->left);
-    }
-
-    NODE* reuse_in(NODE* t) {
-        if (!t) return t;
-        if (is_whole_scalar(t) && !lvalue_is_volatile(t))
-            for (const KNOWN& k : known)
-                if (equiv_mtypes(k.lvalue->type, t->type) && trees_are_congruent(k.lvalue, t, false)) {
-                    NODE* value = copy_tree(k.value);
-                    erase_tree(t);
-                    return value;
-                }
-        if (t->op == UAND || t->op == ARGREF || t->op == STDOT) {
-            // An object, not its value; a pointer on the way to it is a value.
-            NODE* object = t->left;
-            while (object->op == STDOT) object = object->left;
-            if (object->op == UMULT || object->op == STREF) object->left = reuse_in(object->left);
-            return t;
-        }
-        t->left = reuse_in(t->left);
-        if (t->op != STREF) t->right = reuse_in(t->right);
-        return t;
-    }
-
-    void forget_modified(const NODE* t) {
-        auto gone = [&](KNOWN& k) {
-            if (!tree_modifies_lvalue_in_tree(t, k.lvalue) && !tree_modifies_lvalue_in_tree(t, k.value)) return false;
-            erase_tree(k.lvalue);
-            erase_tree(k.value);
-            return true;
-        };
-        known.erase(std::remove_if(known.begin(), known.end(), gone), known.end());
-    }
-
-    // `part = value` and `variable = part`, behind which both hold the same.
-    void learn(const NODE* t) {
-        if (t->op != ASG || tree_is_arg_prolog(t) || known.size() >= MOST_KNOWN) return;
-        const NODE *part = t->left, *value = t->right;
-        if (is_whole_scalar(value)) std::swap(part, value);
-        if (!is_whole_scalar(part) || lvalue_is_volatile(part) || tree_has_side_effects(part)) return;
-        if (value->op != ICON && value->op != FCON && !is_private_variable(value)) return;
-        if (!equiv_mtypes(part->type, value->type)) return;
-        if (tree_modifies_lvalue_in_tree(t, t->left == part ? value : part)) return;
-        if (address_may_change(t, part)) return;
-        known.push_back({copy_tree(part), copy_tree(value)});
-    }
-
-    // Whether the assignment may change the pointer that the part is reached by.
-    static bool address_may_change(const NODE* t, const NODE* part) {
-        while (part->op == STDOT) part = part->left;
-        return part->op != NAME && tree_modifies_lvalue_in_tree(t, part->left);
-    }
-
-    void forget_all() {
-        for (KNOWN& k : known) {
-            erase_tree(k.lvalue);
-            erase_tree(k.value);
-        }
-        known.clear();
-    }
-
-    std::vector<KNOWN> known;
-};
-
 } // namespace
-
-void lcse_subrange_assignments() {
-    if (!currfuninfo || !currfuninfo->bb_list) return;
-    init_aliasing_info(false);
-    KNOWN_VALUES values;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) values.run(bb);
-    reset_alias_info();
-}
 
 void elim_dead_subrange_assigns() {
     if (!currfuninfo || !currfuninfo->bb_list) return;

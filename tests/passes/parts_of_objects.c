@@ -1,96 +1,179 @@
-// Stores to a part that a later store covers go; loads of a part that is known to hold a variable's value take that.
+// Stores to a part that a later store covers go, as do those to objects that no one reads any more; loads of a part that
+// is known to hold a variable's value take that.
 // RUN: --opt_level=2 --disable_inlining
 #include <zrun.h>
 
 struct pair {
     int a, b;
 };
+struct outer {
+    struct pair in;
+    int rest[4];
+    unsigned low : 5, high : 11;
+};
 union word {
     int i;
     unsigned u;
+    float f;
 };
 static volatile struct pair port;
+static struct pair shared;
+static struct outer whole = {{21, 22}, {23}};
+static int taken;
+static int look(void) { return shared.a; }
+static int count(void) { return ++taken; }
 
-// FUNCTION: overwritten
+// ---- Stores that go: 17 is what the first would have multiplied with
+
+// FUNCTION: covered
 // NOT: * 17
-// HAS: /\* 18/
-void overwritten(struct pair* p, int x) {
-    p->a = x * 17;
-    p->b = x;
-    p->a = x * 18;
+// COUNT 5: * 18
+void covered(struct outer* p, union word* w, int* q, int i, int x) {
+    p->in.a = x * 17;
+    p->in.b = x;
+    p->in.a = x * 18;
+    p->rest[i] = x * 17;
+    p->rest[i] = x * 18;
+    q[i + 1] = x * 17;
+    q[1 + i] = x * 18;
+    shared.a = x * 17;
+    shared.a = x * 18;
+    w->i = x * 17;
+    w->i = x * 18;
+    shared.b = x * 17;
+    shared = whole.in;
+    q[9] += x * 17;
+    q[9] = x * 18;
 }
 
+// FUNCTION: effects_stay
+// COUNT 1: _count(
+// COUNT 1: .a
+void effects_stay(struct pair* p, int x) {
+    p->a += count();
+    p->a = x;
+}
+
+// FUNCTION: unread
+// NOT: * 17
+// COUNT 1: _count(
+int unread(int i, int x) {
+    struct pair t;
+    int local[8];
+    t.a = x;
+    t.b = i;
+    if (x > 3) local[i] = t.a * 17;
+    local[i + 1] = count();
+    return t.b;
+}
+
+// FUNCTION: read_on_one_path
+// COUNT 2: * 17
+// COUNT 1: * 18
+int read_on_one_path(int i, int x) {
+    int local[8], other[8], third[8];
+    local[i] = x * 17;
+    if (x > 3) return local[i - 1 + 1];
+    third[i] = x * 17;
+    other[i + 1] = third[i];
+    local[i] = x * 18;
+    for (int n = 0; n < 3; ++n) x += local[i] + other[i + 1];
+    local[i] = x;
+    return x;
+}
+
+// FUNCTION: holds_pointer
+// COUNT 1: * 17
+void holds_pointer(int* q, int x) {
+    struct {
+        int *p, *end;
+    } t[3];
+    for (int i = 0; i < 3; ++i) t[i].p = t[i].end = q + i;
+    *t[x & 1].p = x * 17;
+}
+
+// ---- Stores that stay
+
 // FUNCTION: read_between
-// HAS: /\* 17/
-// HAS: /\* 18/
-int read_between(struct pair* p, int x) {
-    p->a = x * 17;
-    int y = p->a + p->b;
-    p->a = x * 18;
+// COUNT 6: * 17
+// COUNT 6: * 18
+int read_between(struct outer* p, union word* w, int* q, int x) {
+    p->in.a = x * 17;
+    int y = p->in.a + p->in.b;
+    p->in.a = x * 18;
+    p->rest[1] = x * 17;
+    y += *q;
+    p->rest[1] = x * 18;
+    w->i = x * 17;
+    y += (int)w->u;
+    w->i = x * 18;
+    shared.a = x * 17;
+    y += look();
+    shared.a = x * 18;
+    q[x] = x * 17;
+    y += q[q[3] & 1];
+    q[x] = x * 18;
+    port.a = x * 17;
+    port.a = x * 18;
     return y;
 }
 
 // FUNCTION: read_by_the_store
-// HAS: /\* 17/
-void read_by_the_store(struct pair* p, int x) {
+// COUNT 3: * 17
+void read_by_the_store(struct pair* p, int* q, int i, int x) {
     p->a = x * 17;
-    p->a = p->a ^ p->a >> 3;
+    p->a = look() ^ p->a;
+    q[i] = x * 17;
+    q[i] = q[q[i] & 1] + count();
+    shared.a = x * 17;
+    shared.a ^= x;
 }
 
-// FUNCTION: read_by_alias
-// HAS: /\* 17/
-// HAS: /\* 18/
-int read_by_alias(struct pair* p, int* q, int x) {
-    p->a = x * 17;
-    int y = *q;
-    p->a = x * 18;
-    return y;
+// FUNCTION: covered_in_part
+// COUNT 4: * 17
+void covered_in_part(struct outer* p, struct outer* o, int* q, int i, int x) {
+    q[2 * i] = x * 17;
+    q[i] = x;
+    p->rest[i] = x * 17;
+    p->rest[i + 1] = x;
+    p->in = o->in;
+    p->in.a = x * 17;
+    p->high = (unsigned)(x * 17);
+    p->low = 3;
 }
 
-// FUNCTION: pointer_moves
-// HAS: /\* 17/
-// HAS: /\* 18/
-void pointer_moves(struct pair* p, int x) {
+// FUNCTION: place_moves
+// COUNT 2: * 17
+// COUNT 2: * 18
+// COUNT 2: /^\*r =/
+void place_moves(struct pair* p, int** q, int** r, int x) {
     p->a = x * 17;
     ++p;
     p->a = x * 18;
+    **q = x * 17;
+    *q = &taken;
+    **q = x * 18;
+    *r = &shared.a;
+    **r = x;
+    *r = &shared.b;
 }
 
-// FUNCTION: read_as_other_member
-// HAS: /\* 17/
-unsigned read_as_other_member(union word* w, int x) {
-    w->i = x * 17;
-    unsigned y = w->u;
-    w->i = x * 18;
-    return y;
-}
-
-// FUNCTION: volatile_part
-// HAS: /\* 17/
-// HAS: /\* 18/
-void volatile_part(int x) {
-    port.a = x * 17;
-    port.a = x * 18;
-}
-
-static struct pair shared;
-static int look(void) { return shared.a; }
-
-// FUNCTION: read_by_callee
-// HAS: /\* 17/
-// HAS: /\* 18/
-int read_by_callee(int x) {
-    shared.a = x * 17;
-    int y = look();
-    shared.a = x * 18;
-    return y;
-}
+// ---- Loads
 
 // FUNCTION: stored_value
 // COUNT 1: .a
 int stored_value(struct pair* p, int x) {
     p->a = x;
     p->b = p->a * 3;
+    if (x > 9) p->b = p->a * 5;
+    return 1;
+}
+
+// FUNCTION: argument
+// COUNT 1: .b
+int argument(struct pair* p, int x) {
+    p->b = x;
+    put_i32(p->b);
     return 0;
 }
 
@@ -104,23 +187,29 @@ int changed_between(struct pair* p, int* q, int x) {
 }
 
 int main(void) {
-    struct pair p[2] = {{1, 2}, {3, 4}};
+    struct outer p = {{1, 2}, {3, 4, 5, 6}, 7, 8}, o = {{11, 12}, {13, 14, 15, 16}, 17, 18};
     union word w;
-    overwritten(p, 3);
-    put_i32(p[0].a);
-    put_i32(read_between(p, 4));
-    put_i32(read_by_alias(p, &p[0].a, 5));
-    pointer_moves(p, 6);
-    put_i32(p[0].a + p[1].a);
-    put_i32((int)read_as_other_member(&w, 7));
-    read_by_the_store(p, 12);
-    put_i32(p[0].a);
-    volatile_part(8);
-    put_i32(port.a);
-    put_i32(read_by_callee(9));
-    stored_value(p, 10);
-    put_i32(p[0].b);
-    changed_between(p, &p[0].a, 11);
-    put_i32(p[0].b);
+    int q[12] = {1, 0, 1, 1}, *at = q, *r = q;
+    covered(&p, &w, q, 2, 5);
+    put_i32(p.in.a + p.in.b + p.rest[2] + q[3] + shared.a + w.i + q[9]);
+    effects_stay(&p.in, 6);
+    put_i32(p.in.a);
+    put_i32(unread(3, 4) + unread(2, 1) + taken);
+    put_i32(read_on_one_path(3, 4) + read_on_one_path(2, 1));
+    holds_pointer(q, 5);
+    put_i32(q[0]);
+    q[3] = 1;
+    put_i32(read_between(&p, &w, &p.rest[1], 1));
+    put_i32(p.in.a + p.rest[1] + w.i + shared.a + port.a);
+    read_by_the_store(&p.in, q, 2, 12);
+    put_i32(p.in.a + q[2] + shared.a);
+    covered_in_part(&p, &o, q, 1, 6);
+    put_i32(q[2] + p.in.a + p.in.b + p.rest[1] + p.rest[2] + p.high + p.low);
+    struct pair two[2] = {{1, 2}, {3, 4}};
+    place_moves(two, &at, &r, 6);
+    put_i32(two[0].a + two[1].a + q[0] + taken + shared.a);
+    put_i32(stored_value(two, 10) + stored_value(two + 1, 1) + argument(two, 8));
+    changed_between(two, &two[0].a, 11);
+    put_i32(two[0].b);
     return 0;
 }

@@ -48,7 +48,6 @@ register_option pass_debug_optimizer_estimates("debug:optimizer_estimates");
 register_option pass_debug_parsemd("debug:parsemd");
 register_option pass_debug_synrules("debug:synrules");
 
-register_option pass_disable_cps("disable:cps");
 register_option pass_disable_downcounters("disable:downcounters");
 register_option pass_disable_fcprevsymtab("disable:fcprevsymtab");
 register_option pass_disable_ilp("disable:ilp");

@@ -240,6 +240,10 @@ bool join_diamond(BBLK* bb) {
 
 } // namespace
 
+bool may_be_arm_of_select(const NODE* t) {
+    return t->op == ASG && is_plain_target(t->left) && is_plain_arm(t->right);
+}
+
 bool join_diamonds() {
     if (opt_level() == 0) return false;
     bool changed = false;

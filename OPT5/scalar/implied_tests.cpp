@@ -1,8 +1,9 @@
 // Tests that an earlier one decides.
 //
 // A condition q at the end of a block is decided on the way from an earlier IF on p if the way's side of p implies q or
-// its opposite, and nothing between the two tests changes what q reads. Where every way into the block is known, the
-// test goes; where a block is nothing but the test, a single way into it is led around it.
+// its opposite, and nothing between the two tests changes what q reads; so it is behind an assignment of a constant to
+// the one variable that q reads. Where every way into the block is known, the test goes; where a block is nothing but
+// the test, a single way into it is led around it.
 
 #include "OPT5/scalar/simpcfg.h"
 
@@ -11,26 +12,21 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/implied_tests.h"
+#include "OPT5/simp/simp.h"
 
 #include <algorithm>
-#include <optional>
 
 namespace {
 
 constexpr int MAX_BLOCKS_BACK = 8;
-constexpr int MAX_STATEMENTS_BACK = 24;
+constexpr size_t MAX_STATEMENTS_BACK = 24;
 constexpr int MAX_NODES = 32; // of a condition: larger ones are seldom repeated and dear to compare
 
 // ---- What a condition reads
 
-struct READS {
-    std::vector<const SYMTAB*> symbols;
-    bool indirect = false; // through pointers
-    bool exposed = false;  // a symbol that a pointer or a call may reach
-    bool supported = true;
-};
-
 bool is_exposed(const SYMTAB* sym) { return sym->level == 0 || sym->is_aliased() || currfuninfo->address_taken_local; }
+
+} // namespace
 
 READS reads_of(NODE* condition) {
     READS reads;
@@ -57,6 +53,8 @@ READS reads_of(NODE* condition) {
     return reads;
 }
 
+namespace {
+
 bool names_one_of(const NODE* lvalue, const std::vector<const SYMTAB*>& symbols) {
     return std::find(symbols.begin(), symbols.end(), lvalue->u.sym) != symbols.end();
 }
@@ -67,6 +65,8 @@ bool store_may_change(const NODE* lvalue, const READS& reads) {
     if (names_one_of(lvalue, reads.symbols)) return true;
     return reads.indirect && is_exposed(lvalue->u.sym);
 }
+
+} // namespace
 
 bool statement_may_change(NODE* statement, const READS& reads) {
     bool changes = false;
@@ -88,6 +88,8 @@ bool statement_may_change(NODE* statement, const READS& reads) {
     });
     return changes;
 }
+
+namespace {
 
 // ---- Implication
 
@@ -221,14 +223,193 @@ std::optional<bool> implied(const NODE* p, bool sense, const NODE* q) {
     return *known != q_negated;
 }
 
+// ---- Constants
+
+// What `q` is behind `asg`, an assignment of a constant to the one variable that it reads.
+std::optional<bool> outcome_behind(const NODE* asg, const NODE* q) {
+    NODE* t = simp_subst_icon(truncate_to_type(asg->right->u.lval, asg->left->type), asg->left->type->stqs(), asg->left,
+                              copy_tree(q));
+    std::optional<bool> outcome;
+    if (t->op == ICON) outcome = !t->u.lval.is_zero();
+    erase_tree(t);
+    return outcome;
+}
+
+bool assigns_constant(const NODE* t, const SYMTAB* sym) {
+    return t->op == ASG && t->left->op == NAME && t->left->u.sym == sym && t->left->type->is_int() &&
+           t->right->op == ICON && t->right->type->is_int();
+}
+
+} // namespace
+
 // ---- The way back
 
-// A loop's test is left where it is: a way around it would enter the loop in its middle.
+TEST_OUTCOMES::TEST_OUTCOMES() : blocks(static_cast<size_t>(currfuninfo->bb_count) + 1) {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (!bb->is_in_LIR_form()) refresh(bb);
+}
+
+void TEST_OUTCOMES::refresh(BBLK* bb) {
+    if (LAST_STATEMENTS* last = last_of(bb)) *last = {bb->last_statement(), {}};
+}
+
+TEST_OUTCOMES::LAST_STATEMENTS* TEST_OUTCOMES::last_of(const BBLK* bb) {
+    const bool is_known = bb->dfn > 0 && static_cast<size_t>(bb->dfn) < blocks.size();
+    return is_known ? &blocks[static_cast<size_t>(bb->dfn)] : nullptr;
+}
+
+LIST* TEST_OUTCOMES::control_of(const BBLK* bb) {
+    const LAST_STATEMENTS* last = last_of(bb);
+    return last ? last->control : nullptr;
+}
+
+bool TEST_OUTCOMES::ask_for(NODE* condition) {
+    if (count_nodes_in_tree(condition) > MAX_NODES || tree_has_side_effects(condition)) return false;
+    q = condition;
+    reads = reads_of(condition);
+    variable = nullptr;
+    if (!reads.indirect && !reads.symbols.empty() &&
+        std::all_of(reads.symbols.begin(), reads.symbols.end(),
+                    [this](const SYMTAB* sym) { return sym == reads.symbols.front(); }))
+        variable = reads.symbols.front();
+    return reads.supported;
+}
+
+// The statements ahead of the control statement, the last first: all, or as many as are looked at.
+const std::vector<const LIST*>& TEST_OUTCOMES::statements_back(const BBLK* bb) {
+    std::vector<const LIST*>& list = last_of(bb)->statements;
+    if (!list.empty() || !bb->statements->rest) return list;
+    for (const LIST* s = bb->statements; s->rest; s = s->rest) list.push_back(s);
+    std::reverse(list.begin(), list.end());
+    if (list.size() > MAX_STATEMENTS_BACK) list.resize(MAX_STATEMENTS_BACK + 1);
+    list.shrink_to_fit();
+    return list;
+}
+
+// The blocks behind `test`, down to `last`; each is the sole predecessor of the next.
+bool TEST_OUTCOMES::may_change_between(const BBLK* test, const BBLK* last) {
+    size_t budget = MAX_STATEMENTS_BACK;
+    for (const BBLK* bb = last; bb != test; bb = bb->predecessors->first)
+        if (block_may_change(bb, &budget) || statement_may_change(control_of(bb)->first->left, reads)) return true;
+    return false;
+}
+
+bool TEST_OUTCOMES::block_may_change(const BBLK* bb, size_t* budget) {
+    for (const LIST* s : statements_back(bb)) {
+        if (*budget == 0 || statement_may_change(s->first, reads)) return true;
+        --*budget;
+    }
+    return false;
+}
+
+const LIST* TEST_OUTCOMES::first_that_may_change(const BBLK* bb) {
+    size_t statements = 0;
+    for (const LIST* s = bb->statements; s && s->rest; s = s->rest)
+        if (++statements > MAX_STATEMENTS_BACK || statement_may_change(s->first, reads)) return s;
+    return nullptr;
+}
+
+// Whether the last change to what the condition reads, in `pred` itself, is an assignment of a constant.
+const NODE* TEST_OUTCOMES::constant_assignment(const BBLK* pred) {
+    if (!variable) return nullptr;
+    const NODE* control = control_of(pred)->first;
+    if (control->op != BRANCH && (control->op != IF || statement_may_change(control->left, reads))) return nullptr;
+    for (const LIST* s : statements_back(pred)) {
+        if (assigns_constant(s->first, variable)) return s->first;
+        if (statement_may_change(s->first, reads)) return nullptr;
+    }
+    return nullptr;
+}
+
+std::optional<bool> TEST_OUTCOMES::behind_constant(const BBLK* pred) {
+    const NODE* asg = control_of(pred) ? constant_assignment(pred) : nullptr;
+    return asg ? outcome_behind(asg, q) : std::nullopt;
+}
+
+std::optional<bool> TEST_OUTCOMES::on_edge(const BBLK* pred, const BBLK* bb) {
+    const BBLK* const start = pred;
+    for (int steps = 0; steps < MAX_BLOCKS_BACK; ++steps) {
+        const LIST* control = control_of(pred);
+        if (!control) return std::nullopt;
+        const NODE* t = control->first;
+        if (is_test(t)) {
+            const BBLK *on_true = t->right->left->lbl->bblock, *on_false = t->right->right->lbl->bblock;
+            const int outcome = on_true == on_false ? -1 : pred_implies_pred(t->left, on_true == bb, q);
+            if (outcome >= 0) {
+                if (tree_has_side_effects(t->left) || may_change_between(pred, start)) return std::nullopt;
+                return outcome != 0;
+            }
+        } else if (t->op != BRANCH && t->op != SWITCH)
+            return std::nullopt;
+        if (!pred->predecessors || pred->predecessors->rest) return std::nullopt;
+        bb = pred;
+        pred = pred->predecessors->first;
+    }
+    return std::nullopt;
+}
+
+bool is_test(const NODE* t) { return t->op == IF && t->left->op != ENDLOOP; }
+
 bool has_back_edge(const BBLK* bb) {
     for (const EDGE* e = bb->predecessors; e; e = e->rest)
         if (e->first->dfn >= bb->dfn) return true;
     return false;
 }
+
+namespace {
+
+// The assignment of a block behind `test` alone that assigns one cheap value and goes on to `join`, or null.
+const NODE* arm_of_select(const BBLK* arm, const BBLK* test, const BBLK* join) {
+    if (!arm->predecessors || arm->predecessors->rest || arm->predecessors->first != test) return nullptr;
+    const LIST* s = arm->statements;
+    if (!s->rest || s->rest->rest || s->rest->first->op != BRANCH || s->rest->first->left->lbl->bblock != join)
+        return nullptr;
+    return may_be_arm_of_select(s->first) ? s->first : nullptr;
+}
+
+bool is_bounded_by(const NODE* condition, const NODE* assignment) {
+    if (!assignment || !(op_is_int_compare(condition->op) || op_is_float_compare(condition->op))) return false;
+    return sym_appears_in_tree(assignment->left->u.sym, condition) ||
+           trees_are_congruent(assignment->right, condition->right, false);
+}
+
+// Whether `bb` ends in a test that bounds a value, `if (x > 9) x = 9;`, or that chooses one of two values for it.
+bool ends_in_select(TEST_OUTCOMES& outcomes, const BBLK* bb) {
+    const LIST* control = outcomes.control_of(bb);
+    if (!control || !is_test(control->first)) return false;
+    const NODE *condition = control->first->left, *targets = control->first->right;
+    const BBLK *a = targets->left->lbl->bblock, *b = targets->right->lbl->bblock;
+    if (is_bounded_by(condition, arm_of_select(a, bb, b)) || is_bounded_by(condition, arm_of_select(b, bb, a)))
+        return true;
+    const BBLK* join = a->successors ? a->successors->first : nullptr;
+    const NODE *x = join ? arm_of_select(a, bb, join) : nullptr, *y = join ? arm_of_select(b, bb, join) : nullptr;
+    return x && y && x->left->u.sym == y->left->u.sym;
+}
+
+} // namespace
+
+bool joins_selects(TEST_OUTCOMES& outcomes, const BBLK* from, const BBLK* bb) {
+    if (!ends_in_select(outcomes, bb)) return false;
+    if (ends_in_select(outcomes, from)) return true;
+    const EDGE* before = from->predecessors;
+    return before && !before->rest && arm_of_select(from, before->first, bb) && ends_in_select(outcomes, before->first);
+}
+
+bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<WAY_INTO_TEST>* ways) {
+    bool all = true;
+    for (const EDGE* e = bb->predecessors; e; e = e->rest) {
+        if (static_cast<int>(ways->size()) == MAX_BLOCKS_BACK) return false;
+        if (auto outcome = outcomes.behind_constant(e->first))
+            ways->push_back({e->first, *outcome, true});
+        else if ((outcome = outcomes.on_edge(e->first, bb)))
+            ways->push_back({e->first, *outcome, false});
+        else
+            all = false;
+    }
+    return all;
+}
+
+namespace {
 
 void lead_around(BBLK* pred, BBLK* bb, LIST* control, BBLK* target) {
     subst_bb_for_bb_in_stmts(target, bb, control);
@@ -240,94 +421,39 @@ void lead_around(BBLK* pred, BBLK* bb, LIST* control, BBLK* target) {
 class TEST_REMOVER {
 public:
     bool run() {
-        controls.assign(static_cast<size_t>(currfuninfo->bb_count) + 1, nullptr);
-        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            if (!bb->is_in_LIR_form()) control_of(bb) = bb->last_statement();
         bool changed = false;
         for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
-            if (control_of(bb)) changed |= remove_test(bb);
+            if (outcomes.control_of(bb)) changed |= remove_test(bb);
         return changed;
     }
 
 private:
-    LIST*& control_of(const BBLK* bb) { return controls[static_cast<size_t>(bb->dfn)]; }
-
-    static bool is_test(const NODE* t) { return t->op == IF && t->left->op != ENDLOOP; }
-
-    // What the way from `pred` to `bb` says of `q`, back along sole predecessors, if nothing on the way changes it.
-    std::optional<bool> outcome_on_edge(const BBLK* pred, const BBLK* bb, const NODE* q) {
-        const BBLK* const start = pred;
-        for (int blocks = 0; blocks < MAX_BLOCKS_BACK; ++blocks) {
-            const LIST* control = control_of(pred);
-            if (!control) return std::nullopt;
-            const NODE* t = control->first;
-            if (is_test(t)) {
-                const BBLK *on_true = t->right->left->lbl->bblock, *on_false = t->right->right->lbl->bblock;
-                const int outcome = on_true == on_false ? -1 : pred_implies_pred(t->left, on_true == bb, q);
-                if (outcome >= 0) {
-                    if (tree_has_side_effects(t->left) || may_change_between(pred, start)) return std::nullopt;
-                    return outcome != 0;
-                }
-            } else if (t->op != BRANCH && t->op != SWITCH)
-                return std::nullopt;
-            if (!pred->predecessors || pred->predecessors->rest) return std::nullopt;
-            bb = pred;
-            pred = pred->predecessors->first;
-        }
-        return std::nullopt;
-    }
-
-    // The blocks behind `test`, down to `last`; each is the sole predecessor of the next.
-    bool may_change_between(const BBLK* test, const BBLK* last) {
-        int budget = MAX_STATEMENTS_BACK;
-        for (const BBLK* bb = last; bb != test; bb = bb->predecessors->first)
-            if (block_may_change(bb, &budget) || statement_may_change(control_of(bb)->first->left, reads)) return true;
-        return false;
-    }
-
-    bool block_may_change(const BBLK* bb, int* budget) {
-        for (const LIST* s = bb->statements; s && s->rest; s = s->rest)
-            if (--*budget < 0 || statement_may_change(s->first, reads)) return true;
-        return false;
-    }
-
     bool remove_test(BBLK* bb) {
-        LIST* last = control_of(bb);
+        LIST* last = outcomes.control_of(bb);
         NODE* control = last->first;
-        if (!is_test(control) || !bb->predecessors) return false;
-        const NODE* q = control->left;
-        if (count_nodes_in_tree(q) > MAX_NODES || tree_has_side_effects(q)) return false;
-        reads = reads_of(control->left);
-        if (!reads.supported) return false;
-
-        std::vector<std::pair<BBLK*, bool>> known;
-        bool all = true;
-        int predecessors = 0;
-        for (const EDGE* e = bb->predecessors; e; e = e->rest) {
-            if (++predecessors > MAX_BLOCKS_BACK) return false;
-            auto outcome = outcome_on_edge(e->first, bb, q);
-            if (!outcome) {
-                all = false;
-                continue;
-            }
-            known.emplace_back(e->first, *outcome);
-            all &= known.front().second == *outcome;
-        }
-        int budget = MAX_STATEMENTS_BACK;
-        if (known.empty() || block_may_change(bb, &budget)) return false;
+        if (!is_test(control) || !bb->predecessors || !outcomes.ask_for(control->left)) return false;
+        std::vector<WAY_INTO_TEST> known;
+        const bool all = find_outcomes(outcomes, bb, &known);
+        if (known.empty() || outcomes.first_that_may_change(bb)) return false;
         BBLK* targets[2] = {control->right->right->lbl->bblock, control->right->left->lbl->bblock};
-        if (all) {
-            make_branch(bb, last, targets[known.front().second]);
-            if (last->rest) control_of(bb) = last->rest;
+        const bool first = known.front().outcome;
+        if (all &&
+            std::all_of(known.begin(), known.end(), [&](const WAY_INTO_TEST& w) { return w.outcome == first; })) {
+            make_branch(bb, last, targets[first]);
+            outcomes.refresh(bb);
             return true;
         }
         if (last != bb->statements || has_back_edge(bb)) return false;
-        for (auto [pred, outcome] : known) lead_around(pred, bb, control_of(pred), targets[outcome]);
-        return true;
+        bool changed = false;
+        for (const WAY_INTO_TEST& way : known) {
+            if (way.by_constant && joins_selects(outcomes, way.from, bb)) continue;
+            lead_around(way.from, bb, outcomes.control_of(way.from), targets[way.outcome]);
+            changed = true;
+        }
+        return changed;
     }
 
-    std::vector<LIST*> controls; // by dfn
-    READS reads;                 // of the condition in work
+    TEST_OUTCOMES outcomes;
 };
 
 } // namespace

@@ -1,9 +1,72 @@
 // Whether one condition decides another.
 #pragma once
 
+#include <optional>
+#include <vector>
+
+class BBLK;
 class NODE;
+class SYMTAB;
+struct LIST;
 
 // What `q` is where `p` has the truth value `sense`: 1 true, 0 false, -1 unknown. Neither may have side effects; both
 // are evaluated on the same values. A NaN is no integer: floating conditions decide only themselves and their exact
 // opposite.
 int pred_implies_pred(const NODE* p, bool sense, const NODE* q);
+
+struct READS {
+    std::vector<const SYMTAB*> symbols;
+    bool indirect = false; // through pointers
+    bool exposed = false;  // a symbol that a pointer or a call may reach
+    bool supported = true;
+};
+READS reads_of(NODE* condition);
+bool statement_may_change(NODE* statement, const READS& reads);
+
+bool is_test(const NODE* control); // an IF on a value
+// A loop's test is left where it is: a way around it would enter the loop in its middle.
+bool has_back_edge(const BBLK* bb);
+
+// What a condition is on the ways into its block. Valid while the graph of the blocks that it saw stands; blocks made
+// later decide nothing. After `ask_for` the other questions are about that condition.
+class TEST_OUTCOMES {
+public:
+    TEST_OUTCOMES();
+    LIST* control_of(const BBLK* bb); // the last cell of its statements, or null
+    void refresh(BBLK* bb);           // its statements have changed
+    bool ask_for(NODE* condition);    // false if nothing can be said of it; borrowed
+    // At the end of `pred`, where it assigns a constant to the variable of the condition.
+    std::optional<bool> behind_constant(const BBLK* pred);
+    // At the end of `pred` on the way to `bb`, by a test: back along sole predecessors, if nothing on the way changes
+    // it.
+    std::optional<bool> on_edge(const BBLK* pred, const BBLK* bb);
+    // In front of the control statement, which is not looked at; a block of very many counts as one that may.
+    const LIST* first_that_may_change(const BBLK* bb);
+
+private:
+    struct LAST_STATEMENTS {
+        LIST* control = nullptr;
+        std::vector<const LIST*> statements; // found when they are asked for
+    };
+    LAST_STATEMENTS* last_of(const BBLK* bb);
+    const std::vector<const LIST*>& statements_back(const BBLK* bb);
+    bool may_change_between(const BBLK* test, const BBLK* last);
+    bool block_may_change(const BBLK* bb, size_t* budget);
+    const NODE* constant_assignment(const BBLK* pred);
+
+    std::vector<LAST_STATEMENTS> blocks; // by depth-first number
+    const NODE* q = nullptr;
+    READS reads;
+    const SYMTAB* variable = nullptr; // the only one that `q` reads
+};
+
+struct WAY_INTO_TEST {
+    BBLK* from;
+    bool outcome;
+    bool by_constant; // not by a test
+};
+// Whether the test at the end of `bb` and the one that `from` comes from each only choose a value for a variable: as
+// two selects they cost no jump, which a way around the second would.
+bool joins_selects(TEST_OUTCOMES& outcomes, const BBLK* from, const BBLK* bb);
+// The ways into `bb` whose outcome is known; whether those are all. Of very many not all are found.
+bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<WAY_INTO_TEST>* ways);

@@ -41,3 +41,4 @@ bool resync_edges(BBLK* bb);
 bool remove_redundant_tests();
 bool cross_jump();
 bool join_diamonds();
+bool may_be_arm_of_select(const NODE* assignment); // cheap, and safe where the condition does not hold

@@ -222,5 +222,3 @@ void add_loop_annotation_from_profile() {
         insert_stmt_before_stmt_in_bb(mark, last, before, last->psn);
     }
 }
-
-void straighten_cond_paths() {}

@@ -1,0 +1,187 @@
+// Conditional paths: a test whose outcome is known on some of the ways to it, behind a few statements of its own.
+//
+//     if (c) A; T; if (c) B;     becomes     if (c) { A; T; B } else { T }
+//
+// The block of the second test is copied for the ways whose outcome is known, the copy ends in a jump to where that
+// outcome leads, and the ways go to the copy. That needs the statements, the tail, to leave alone what the condition
+// reads. A test that all ways agree on, or that has no tail, needs no copy and goes with the redundant tests.
+//
+// Growth is bounded: a tail is a few nodes, all copies together a part of the function, and where size is the goal
+// there are none. A test that closes or heads a loop stays, so that the loop keeps one way in and one way back.
+
+#include "OPT5/scalar/simpcfg.h"
+
+#include "DEBUG_DISABLE/register_option.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/implied_tests.h"
+#include "OPT5/scalar/lowering.h"
+#include "OPT5/simp/seq.h"
+
+#include <algorithm>
+#include <vector>
+
+register_option pass_disable_cps("disable:cps");
+
+namespace {
+
+constexpr int LARGEST_TAIL = 24;      // nodes of what is copied
+constexpr int LEAST_GROWTH = 64;      // nodes that any function may grow by
+constexpr int SHARE_OF_FUNCTION = 12; // and beyond that one in so many of its own
+constexpr int MOST_ROUNDS = 4;        // a test behind a copied one may be decided by that
+constexpr int SPEED_MATTERS = 3;
+
+struct CANDIDATE {
+    BBLK* bb;
+    std::vector<WAY_INTO_TEST> ways;
+    bool all; // no way's outcome is unknown
+};
+
+bool may_be_copied(NODE* t) {
+    switch (t->op) {
+    case PPRAGMA:
+    case ASM:
+    case LABELDEF:
+    case LOOP:
+    case PCOMMA:
+    case ASSERT:
+    case NASSERT: return false;
+    default: return !tree_contains_op(t, ASM) && !tree_is_arg_prolog(t) && !calls_setjmp(t);
+    }
+}
+
+// The nodes of a block's statements, or -1 for what is too large or must stay single.
+int nodes_of_tail(const BBLK* bb) {
+    int nodes = 0;
+    for (const LIST* s = bb->statements; s->rest; s = s->rest) {
+        if (!may_be_copied(s->first)) return -1;
+        nodes += count_nodes_in_tree(s->first);
+        if (nodes > LARGEST_TAIL) return -1;
+    }
+    return nodes;
+}
+
+int nodes_of_function() {
+    int nodes = 0;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest) nodes += count_nodes_in_tree(s->first);
+    return nodes;
+}
+
+class COND_PATHS {
+public:
+    explicit COND_PATHS(int growth) : growth_left(growth) {}
+
+    bool round() {
+        TEST_OUTCOMES known;
+        outcomes = &known;
+        if (print_debug) debug_printf("-- cps search phase --\n");
+        std::vector<CANDIDATE> candidates = search();
+        if (candidates.empty()) return false;
+        if (print_debug) debug_printf("-- cps qualify phase --\n");
+        bool changed = false;
+        for (CANDIDATE& c : candidates)
+            if (qualifies(c)) changed |= combine(c);
+        return changed;
+    }
+
+private:
+    std::vector<CANDIDATE> search() {
+        std::vector<CANDIDATE> found;
+        for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink) {
+            LIST* control = outcomes->control_of(bb);
+            if (!control || control == bb->statements || !is_test(control->first)) continue;
+            if (!bb->predecessors || !bb->predecessors->rest || has_back_edge(bb)) continue;
+            if (nodes_of_tail(bb) < 0 || !outcomes->ask_for(control->first->left)) continue;
+            CANDIDATE c{bb, {}, false};
+            c.all = find_outcomes(*outcomes, bb, &c.ways);
+            if (!c.ways.empty()) found.push_back(c);
+        }
+        return found;
+    }
+
+    static BBLK* target(const NODE* test, bool outcome) {
+        return (outcome ? test->right->left : test->right->right)->lbl->bblock;
+    }
+
+    // An earlier change may have taken ways away; those that are left lead as they did.
+    bool qualifies(CANDIDATE& c) {
+        const NODE* test = outcomes->control_of(c.bb)->first;
+        outcomes->ask_for(test->left);
+        if (const LIST* kill = outcomes->first_that_may_change(c.bb)) {
+            if (print_debug)
+                debug_printf("-- %s kills our tail %s, do not combine\n", stmt2infix(kill->first).c_str(),
+                             tree_to_infix(test->left).c_str());
+            return false;
+        }
+        auto is_unfit = [&](const WAY_INTO_TEST& way) {
+            const BBLK* to = target(test, way.outcome);
+            return to->dfn <= c.bb->dfn || !edge_memberp(c.bb, way.from->successors) ||
+                   joins_selects(*outcomes, way.from, c.bb);
+        };
+        const size_t before = c.ways.size();
+        c.ways.erase(std::remove_if(c.ways.begin(), c.ways.end(), is_unfit), c.ways.end());
+        c.all &= c.ways.size() == before;
+        return !c.ways.empty();
+    }
+
+    // The ways of each outcome share a copy; where every way is known, those of the first keep the block itself.
+    bool combine(const CANDIDATE& c) {
+        const bool first = c.ways.front().outcome;
+        const bool agree = std::all_of(c.ways.begin(), c.ways.end(), [&](auto& w) { return w.outcome == first; });
+        if (c.all && agree) return false;
+        const int copies = (c.all ? 0 : 1) + (agree ? 0 : 1), nodes = nodes_of_tail(c.bb);
+        if (copies * nodes > growth_left) return false;
+        growth_left -= copies * nodes;
+        const NODE* test = outcomes->control_of(c.bb)->first;
+        BBLK* const to[2] = {target(test, false), target(test, true)};
+        for (bool outcome : {first, !first}) {
+            if (outcome == first ? c.all : agree) continue;
+            BBLK* copy = copy_tail(c.bb, to[outcome]);
+            for (const WAY_INTO_TEST& way : c.ways)
+                if (way.outcome == outcome) lead_to(way.from, c.bb, copy);
+        }
+        if (c.all) make_branch(c.bb, outcomes->control_of(c.bb), to[first]);
+        outcomes->refresh(c.bb);
+        return true;
+    }
+
+    static BBLK* copy_tail(BBLK* bb, BBLK* to) {
+        LIST *tail = nullptr, **end = &tail;
+        const LIST* s = bb->statements;
+        for (; s->rest; s = s->rest, end = &(*end)->rest) *end = mkelist(copy_tree(s->first), nullptr, s->psn);
+        *end = mkelist(mk_BRANCH(to), nullptr, s->psn);
+        BBLK* copy = insert_new_bb(-1, bb, tail);
+        connect(copy, to);
+        return copy;
+    }
+
+    void lead_to(BBLK* from, BBLK* bb, BBLK* copy) {
+        subst_bb_for_bb_in_stmts(copy, bb, outcomes->control_of(from));
+        disconnect(from, bb);
+        connect(from, copy);
+    }
+
+    TEST_OUTCOMES* outcomes = nullptr;
+    int growth_left;
+};
+
+} // namespace
+
+void straighten_cond_paths() {
+    FUNINFO* f = currfuninfo;
+    if (!f || !f->bb_list || opt_level() < 2 || size_speed_goal() < SPEED_MATTERS || pass_disable_cps) return;
+    renumber_bblocks();
+    COND_PATHS paths(LEAST_GROWTH + nodes_of_function() / SHARE_OF_FUNCTION);
+    bool changed = false;
+    for (int i = 0; i < MOST_ROUNDS && paths.round(); ++i) {
+        changed = true;
+        rebuildcfg();
+        simpcfg(false, false);
+        renumber_bblocks();
+    }
+    // What was assigned for a test that is gone would hide from the propagation of constants what the others see.
+    if (changed) elim_dead_assigns(true, true);
+}

@@ -1,5 +1,12 @@
-// Names of variables: separate live ranges get symbols of their own, symbols that never meet share one.
+// Names of variables: separate live ranges get symbols of their own, and the inductions of a loop are as few as will
+// do.
 #pragma once
+
+class SYMTAB;
 
 void rename_symbols();
 void merge_symbols();
+
+// The pointers of the current function that a use of them has an offset to.
+void init_skewed_offset_syms();
+bool is_skewed_offset_sym(const SYMTAB* sym);

@@ -1,0 +1,374 @@
+#include "OPT5/scalar/inductions.h"
+
+#include "BITVEC/bitvec.h"
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/natural_loops.h"
+#include "OPT5/simp/seq.h"
+#include "OPT5/simp/symbolic.h"
+
+#include <algorithm>
+
+bool is_private_scalar(const SYMTAB* sym) {
+    if (!sym || sym->level != 2 || sym->is_aliased() || sym->type->is_volatile() || !sym->type->is_scalar())
+        return false;
+    if (sym->sclass != SC_AUTO && sym->sclass != SC_REGISTER && sym->sclass != SC_REGISTER2) return false;
+    return !currfuninfo->has_eh() || !sym_appears_in_EHT(sym);
+}
+
+namespace {
+
+constexpr unsigned ADDRESS_BITS = 32;
+constexpr double ROUNDS_UNKNOWN = 12;
+
+// The NAME that a write goes to, wholly or in part; null where it goes through a pointer.
+const NODE* written_name(const NODE* t) {
+    while (t->op == STDOT || t->op == REAL || t->op == IMAG || t->op == VFIELD || t->op == SIMDHI || t->op == SIMDLO ||
+           t->op == VRCONV || t->op == DDNODE || t->op == IDENTITY)
+        t = t->left;
+    return t->op == NAME ? t : nullptr;
+}
+
+bool may_count(const SYMTAB* sym) {
+    const TYPE* t = sym->type;
+    const bool is_integer = t->is_int() && !t->is_bool() && (t->size == 16 || t->size == ADDRESS_BITS);
+    return (is_integer || t->is_pointer()) && !(t->qual_kind(false) & QUAL_RESTRICT) && is_private_scalar(sym) &&
+           !find_widened_symbol_entry(sym);
+}
+
+// The constant that `value` adds to the variable; 0 for another tree.
+int64_t added_constant(int op, const NODE* name, const NODE* c) {
+    if (c->op != ICON || !c->u.lval.fits<int32_t>()) return 0;
+    const TYPE* type = name->u.sym->type;
+    // What is computed in an unsigned or in a wider type wraps where the variable's own arithmetic does not.
+    if (type->is_int() && !type->is_unsigned() && (c->type->is_unsigned() || c->type->size > type->size)) return 0;
+    const int64_t by = c->u.lval.fits_in<int32_t>();
+    return op == PLUS ? by : -by;
+}
+
+int64_t step_of(const NODE* t) {
+    const NODE* name = t->left;
+    if (!name || name->op != NAME || !t->right) return 0;
+    switch (t->op) {
+    case PLUSPLUS:
+    case PLUSASG: return added_constant(PLUS, name, t->right);
+    case MINMIN:
+    case MINUSASG: return added_constant(MINUS, name, t->right);
+    case ASG: {
+        const NODE* sum = t->right;
+        if ((sum->op != PLUS && sum->op != MINUS) || sum->left->op != NAME || sum->left->u.sym != name->u.sym) return 0;
+        if (name->u.sym->type->is_int() && (sum->type->size != name->u.sym->type->size ||
+                                            sum->type->is_unsigned() != name->u.sym->type->is_unsigned()))
+            return 0;
+        return added_constant(sum->op, name, sum->right);
+    }
+    default: return 0;
+    }
+}
+
+bool is_assignment(int op) {
+    return side_effects[op] == 1 || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
+}
+
+bool is_understood(const NODE* t) {
+    return t->op != ASM && t->op != LOOP && t->op != INITLOOP && t->op != ENDLOOP && !tree_is_EH_SWITCH(t) &&
+           !tree_is_arg_prolog(t) && !(t->op == IF && t->left->op == ENDLOOP);
+}
+
+int64_t in_type(int64_t v, TYPE* type) { return truncate_to_type(INT65(v), type).fits_in<int64_t>(); }
+
+} // namespace
+
+LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all), loop(of), estimate(ROUNDS_UNKNOWN) {
+    usable = loop->is_reducible;
+    if (usable) collect_assignments();
+    if (!usable) return;
+    keep_inductions();
+    if (in_order.empty()) return;
+    find_starts();
+    find_tests();
+    judge_wrapping();
+    estimate_rounds();
+}
+
+// ---- What is assigned
+
+void LOOP_FACTS::collect_assignments() {
+    for (BBLK* bb : loop->blocks) {
+        if (bb->is_in_LIR_form()) usable = false;
+        for (LIST* s = bb->statements; s && usable; s = s->rest) enter_statement(bb, s->first);
+    }
+}
+
+void LOOP_FACTS::enter_statement(BBLK* bb, NODE* t) {
+    if (t->op == PPRAGMA || tree_is_ASM_comment(t)) return;
+    if (!is_understood(t)) {
+        usable = false;
+        return;
+    }
+    for_each_node(t, [this](const NODE* n) {
+        if (n->op == NAME) ++names[n->u.sym];
+    });
+    if (const int64_t by = step_of(t); by && may_count(t->left->u.sym)) {
+        INDUCTION& induction = inductions[t->left->u.sym];
+        induction.sym = t->left->u.sym;
+        if (induction.steps.empty()) in_order.push_back(&induction);
+        induction.steps.push_back({bb, t, by});
+        ++assignments[induction.sym];
+        return;
+    }
+    for_each_node(t, [this](const NODE* n) {
+        if (!n->left || !is_assignment(n->op)) return;
+        if (const NODE* name = written_name(n->left)) ++assignments[name->u.sym];
+    });
+}
+
+void LOOP_FACTS::keep_inductions() {
+    in_order.erase(
+        std::remove_if(in_order.begin(), in_order.end(),
+                       [this](const INDUCTION* i) { return assignments[i->sym] != static_cast<int>(i->steps.size()); }),
+        in_order.end());
+    std::unordered_map<const SYMTAB*, INDUCTION> kept;
+    std::vector<const SYMTAB*> symbols;
+    for (INDUCTION* i : in_order) {
+        symbols.push_back(i->sym);
+        kept[i->sym] = std::move(*i);
+    }
+    inductions.swap(kept);
+    in_order.clear();
+    for (const SYMTAB* sym : symbols) in_order.push_back(&inductions[sym]);
+}
+
+INDUCTION* LOOP_FACTS::induction(const SYMTAB* sym) {
+    auto it = inductions.find(sym);
+    return it == inductions.end() ? nullptr : &it->second;
+}
+
+// ---- Invariants
+
+// Another variable than a private one: nothing in the loop may write to it.
+bool LOOP_FACTS::is_unchanged(const SYMTAB* sym, const NODE* name) {
+    if (auto it = unchanged.find(sym); it != unchanged.end()) return it->second;
+    bool stays = --questions_left >= 0 && !sym->type->is_volatile() && !name->type->is_volatile();
+    for (size_t i = 0; stays && i < loop->blocks.size(); ++i)
+        stays = !bb_modifies_lvalue_in_tree(loop->blocks[i], name);
+    return unchanged[sym] = stays;
+}
+
+bool LOOP_FACTS::is_invariant(const NODE* t) {
+    switch (t->op) {
+    case ICON: return true;
+    case NAME: {
+        const SYMTAB* sym = t->u.sym;
+        if (!sym || !t->type->is_scalar() || lvalue_is_volatile(t) || (sym->type->qual_kind(false) & QUAL_RESTRICT))
+            return false;
+        if (!t->type->is_pointer() && (!t->type->is_int() || t->type->size > ADDRESS_BITS)) return false;
+        if (is_private_scalar(sym)) return !assignments.count(sym);
+        return is_unchanged(sym, t);
+    }
+    case UAND: {
+        const NODE* object = t->left;
+        while (object->op == STDOT) object = object->left;
+        return object->op == NAME && object->u.sym && !object->u.sym->is_function();
+    }
+    case PLUS:
+    case MINUS:
+    case MULT:
+    case ANDB:
+    case ORB:
+    case XORB:
+    case SLL:
+    case SRL:
+        if (!t->type->is_int() && !t->type->is_pointer()) return false;
+        return is_invariant(t->left) && is_invariant(t->right);
+    case UMINUS:
+    case NOTB:
+    case SCONV:
+    case PCONV:
+        if (!t->left->type->is_int() && !t->left->type->is_pointer()) return false;
+        return (t->type->is_int() || t->type->is_pointer()) && is_invariant(t->left);
+    default: return false;
+    }
+}
+
+bool LOOP_FACTS::stays_linear_when_widened(const SYMTAB* sym) const {
+    auto it = inductions.find(sym);
+    return it != inductions.end() && !it->second.wraps;
+}
+
+int LOOP_FACTS::mentions(const SYMTAB* sym) const {
+    auto it = names.find(sym);
+    return it == names.end() ? 0 : it->second;
+}
+
+bool LOOP_FACTS::is_used_after(const SYMTAB* sym) const {
+    const int bit = live_index(sym);
+    if (bit < 0) return true;
+    for (const BBLK* bb : loop->blocks)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (!loops.contains(loop, e->first) && e->first->live_sets[LIVE_IN]->test(static_cast<uint32_t>(bit)))
+                return true;
+    return false;
+}
+
+// ---- Values on entry
+
+void LOOP_FACTS::find_starts() {
+    constexpr int MOST_BLOCKS = 6;
+    const BBLK* bb = nullptr;
+    for (const EDGE* e = loop->header->predecessors; e; e = e->rest) {
+        if (loops.contains(loop, e->first)) continue;
+        if (bb) return;
+        bb = e->first;
+    }
+    std::unordered_map<const SYMTAB*, bool> seen; // an assignment behind the place looked at
+    for (int n = 0; bb && n < MOST_BLOCKS; ++n) {
+        std::vector<NODE*> statements;
+        for (LIST* s = bb->statements; s; s = s->rest) statements.push_back(s->first);
+        for (auto it = statements.rbegin(); it != statements.rend(); ++it) {
+            NODE* root = *it;
+            for_each_node(root, [&](const NODE* t) {
+                if (!t->left || !is_assignment(t->op)) return;
+                const NODE* name = written_name(t->left);
+                INDUCTION* i = name ? induction(name->u.sym) : nullptr;
+                if (!i || !seen.emplace(i->sym, true).second) return;
+                if (t != root || t->op != ASG || t->left != name || t->right->op != ICON) return;
+                if (!i->sym->type->is_int() || !t->right->u.lval.fits<int32_t>()) return;
+                i->start_is_known = true;
+                i->start = in_type(t->right->u.lval.fits_in<int32_t>(), i->sym->type);
+                if (n == 0 && !bb->successors->rest) i->start_statement = root;
+            });
+        }
+        bb = bb->predecessors && !bb->predecessors->rest ? bb->predecessors->first : nullptr;
+    }
+}
+
+// ---- Tests
+
+bool LOOP_FACTS::runs_once_a_round(const BBLK* bb) const {
+    return loops.around(bb) == loop && loops.dominates_latches(bb, loop);
+}
+
+void LOOP_FACTS::find_tests() {
+    for (BBLK* bb : loop->blocks) {
+        NODE* branch = bb->branch();
+        if (!branch || branch->op != IF || !op_is_int_compare(branch->left->op) || !runs_once_a_round(bb)) continue;
+        const NODE* compare = branch->left;
+        LOOP_TEST test;
+        test.bb = bb;
+        test.branch = branch;
+        test.stay_op = compare->op;
+        const NODE *counter = compare->left, *limit = compare->right;
+        if (counter->op != NAME || !is_induction(counter->u.sym)) {
+            std::swap(counter, limit);
+            test.stay_op = commute_inv[compare->op];
+        }
+        if (counter->op != NAME || !is_induction(counter->u.sym) || !is_invariant(limit)) continue;
+        test.counter = induction(counter->u.sym);
+        test.limit = limit;
+        if (!limit->type->is_int() || !counter->type->is_int() || limit->type->size != counter->type->size ||
+            test.counter->steps.size() != 1 || !runs_once_a_round(test.counter->steps.front().bb))
+            continue;
+        const BBLK *yes = branch->right->left->lbl->bblock, *no = branch->right->right->lbl->bblock;
+        if (loops.contains(loop, yes) == loops.contains(loop, no)) continue;
+        test.stays_if_true = loops.contains(loop, yes);
+        if (!test.stays_if_true) test.stay_op = boolean_inv[test.stay_op];
+        const bool is_signed_op = test.stay_op <= GT;
+        if (test.stay_op != EQ && test.stay_op != NEQ &&
+            (is_signed_op == counter->type->is_unsigned() || is_signed_op == limit->type->is_unsigned()))
+            continue;
+        test.step_comes_first = loops.dominates(test.counter->steps.front().bb, bb);
+        exits.push_back(test);
+    }
+}
+
+namespace {
+
+bool stays(int op, int64_t value, int64_t limit) {
+    switch (op) {
+    case EQ: return value == limit;
+    case NEQ: return value != limit;
+    case LT:
+    case ULT: return value < limit;
+    case LE:
+    case ULE: return value <= limit;
+    case GT:
+    case UGT: return value > limit;
+    default: return value >= limit;
+    }
+}
+
+} // namespace
+
+int64_t constant_rounds(const LOOP_TEST& test, int64_t* last_value) {
+    const INDUCTION& i = *test.counter;
+    if (!i.start_is_known || test.limit->op != ICON || !test.limit->u.lval.fits<int32_t>()) return -1;
+    const int64_t by = i.steps.front().by, limit = in_type(test.limit->u.lval.fits_in<int32_t>(), i.sym->type);
+    int64_t value = i.start + (test.step_comes_first ? by : 0), rounds = test.step_comes_first ? 1 : 0;
+    if (stays(test.stay_op, value, limit)) {
+        const int64_t distance = by > 0 ? limit - value : value - limit, size = by > 0 ? by : -by;
+        int64_t more = 0;
+        switch (test.stay_op) {
+        case LT:
+        case ULT:
+        case GT:
+        case UGT: more = (distance + size - 1) / size; break;
+        case LE:
+        case ULE:
+        case GE:
+        case UGE: more = distance / size + 1; break;
+        case NEQ:
+            if (distance % size) return -1;
+            more = distance / size;
+            break;
+        default: return -1;
+        }
+        if (distance < 0) return -1; // runs away from its limit
+        value += more * by;
+        rounds += more;
+    }
+    if (stays(test.stay_op, value, limit) || in_type(value, i.sym->type) != value) return -1;
+    *last_value = value;
+    return rounds;
+}
+
+// An unsigned counter does not wrap where each step follows a test that leaves room for it, or the first step follows a
+// known start.
+void LOOP_FACTS::judge_wrapping() {
+    for (INDUCTION* i : in_order)
+        i->wraps = i->sym->type->is_int() && i->sym->type->is_unsigned() && i->sym->type->size < ADDRESS_BITS &&
+                   unsigned_index_wraps;
+    for (const LOOP_TEST& test : exits) {
+        INDUCTION& i = *test.counter;
+        int64_t last;
+        if (!i.wraps) continue;
+        if (constant_rounds(test, &last) >= 0) {
+            i.wraps = false;
+            continue;
+        }
+        const int64_t by = i.steps.front().by, top = (int64_t(1) << i.sym->type->size) - 1;
+        if (test.step_comes_first && (!i.start_is_known || i.start + by < 0 || i.start + by > top)) continue;
+        // The last value that stays, and the step from there.
+        INT65 farthest;
+        switch (test.stay_op) {
+        case ULT: farthest = calculate_maxval_for_tree(test.limit, nullptr) - INT65(1); break;
+        case ULE: farthest = calculate_maxval_for_tree(test.limit, nullptr); break;
+        case UGT: farthest = calculate_minval_for_tree(test.limit, nullptr) + INT65(1); break;
+        case UGE: farthest = calculate_minval_for_tree(test.limit, nullptr); break;
+        default: continue;
+        }
+        const bool goes_up = test.stay_op == ULT || test.stay_op == ULE;
+        if (goes_up == (by > 0)) i.wraps = farthest + INT65(by) < INT65(0) || farthest + INT65(by) > INT65(top);
+    }
+}
+
+void LOOP_FACTS::estimate_rounds() {
+    int64_t last;
+    for (const LOOP_TEST& test : exits)
+        if (const int64_t n = constant_rounds(test, &last); n >= 0)
+            estimate = std::min(estimate == ROUNDS_UNKNOWN ? 1000.0 : estimate, static_cast<double>(n));
+}

@@ -1,0 +1,88 @@
+// What moves in a natural loop, and how often the loop runs.
+#pragma once
+
+#include "OPT5/scalar/linear_address.h"
+
+#include <cstdint>
+#include <unordered_map>
+#include <vector>
+
+class BBLK;
+class NODE;
+class SYMTAB;
+struct LIST;
+struct NATURAL_LOOP;
+class NATURAL_LOOPS;
+
+// A variable that every assignment of the loop steps by a constant, in a statement of its own.
+struct INDUCTION {
+    struct STEP {
+        BBLK* bb;
+        NODE* statement;
+        int64_t by;
+    };
+    SYMTAB* sym;
+    std::vector<STEP> steps;
+    int64_t start = 0; // on entry to the loop, if that is known
+    bool start_is_known = false;
+    NODE* start_statement = nullptr; // which assigns it, if that is in the block ahead
+    bool wraps = true;               // a narrow unsigned one: not shown not to
+};
+
+// A test that leaves the loop, once in each round.
+struct LOOP_TEST {
+    BBLK* bb = nullptr;
+    NODE* branch = nullptr;       // the IF
+    INDUCTION* counter = nullptr; // which has one step in each round
+    const NODE* limit = nullptr;  // invariant
+    int stay_op = 0;              // the loop goes on while `counter stay_op limit`
+    bool stays_if_true = false;   // of the compare as it stands
+    bool step_comes_first = false;
+};
+
+class LOOP_FACTS final : public LINEAR_LEAVES {
+public:
+    LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of);
+    // False for a loop that is better left alone: it holds what is not understood, or can be entered in another way.
+    bool is_usable() const { return usable; }
+    INDUCTION* induction(const SYMTAB* sym);
+    const std::vector<INDUCTION*>& all_inductions() const { return in_order; }
+    const std::vector<LOOP_TEST>& tests() const { return exits; }
+    double rounds() const { return estimate; }
+    int mentions(const SYMTAB* sym) const;       // NAMEs in the loop
+    bool is_used_after(const SYMTAB* sym) const; // its value may be read where the loop is left
+
+    bool is_induction(const SYMTAB* sym) const override { return inductions.count(sym) != 0; }
+    bool is_invariant(const NODE* tree) override;
+    bool stays_linear_when_widened(const SYMTAB* sym) const override;
+
+private:
+    void collect_assignments();
+    void enter_statement(BBLK* bb, NODE* t);
+    void enter_assignments(const NODE* t, const NODE* step);
+    void keep_inductions();
+    void find_starts();
+    void find_tests();
+    bool runs_once_a_round(const BBLK* bb) const;
+    void judge_wrapping();
+    void estimate_rounds();
+    bool is_unchanged(const SYMTAB* sym, const NODE* name);
+
+    const NATURAL_LOOPS& loops;
+    NATURAL_LOOP* loop;
+    bool usable = true;
+    double estimate;
+    std::unordered_map<const SYMTAB*, INDUCTION> inductions; // looked up
+    std::vector<INDUCTION*> in_order;
+    std::unordered_map<const SYMTAB*, int> assignments; // of private variables, in the loop
+    std::unordered_map<const SYMTAB*, int> names;
+    std::unordered_map<const SYMTAB*, bool> unchanged; // other variables that were asked about
+    std::vector<LOOP_TEST> exits;
+    int questions_left = 16; // each looks at the whole loop
+};
+
+// Whether only its NAME reads and writes a local scalar.
+bool is_private_scalar(const SYMTAB* sym);
+// The constant number of rounds that a test allows, or -1; `first` gets the counter's value at the first test that
+// leaves the loop.
+int64_t constant_rounds(const LOOP_TEST& test, int64_t* last_value);

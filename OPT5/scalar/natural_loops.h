@@ -1,0 +1,59 @@
+// The natural loops of the current function's graph, and the place ahead of one.
+//
+// A back edge leads to a block that dominates its source; the loop of a header is what reaches a back edge to it
+// without passing the header. Cycles that are entered in two places are no loops here.
+#pragma once
+
+#include <cstddef>
+#include <memory>
+#include <vector>
+
+class BBLK;
+struct LIST;
+class NODE;
+
+struct NATURAL_LOOP {
+    BBLK* header = nullptr;
+    std::vector<BBLK*> blocks; // the header first; those of inner loops too
+    std::vector<BBLK*> latches;
+    NATURAL_LOOP* parent = nullptr;
+    int depth = 1;            // 1 of an outermost loop
+    int inside = 0;           // levels of loops in it
+    bool is_reducible = true; // no cycle in it but through headers
+};
+
+class NATURAL_LOOPS {
+public:
+    NATURAL_LOOPS(); // of the current function, whose blocks are numbered
+    const std::vector<std::unique_ptr<NATURAL_LOOP>>& inner_first() const { return loops; }
+    // The innermost loop around a block, or null.
+    NATURAL_LOOP* around(const BBLK* bb) const;
+    bool contains(const NATURAL_LOOP* loop, const BBLK* bb) const;
+    // Of blocks that the graph had at construction.
+    bool dominates(const BBLK* a, const BBLK* b) const;
+    bool dominates_latches(const BBLK* bb, const NATURAL_LOOP* loop) const;
+
+    // The block that control passes right ahead of the loop, and nowhere else leads from. Made if there is none: the
+    // numbers of the blocks are stale then. Null where that would part a promise from its loop.
+    BBLK* block_ahead(NATURAL_LOOP* loop);
+    bool has_split_edges() const { return split; }
+
+private:
+    void number_dominator_tree();
+    void find_back_edges();
+    void collect(NATURAL_LOOP* loop);
+    void nest();
+    void mark_irreducible();
+    size_t slot(const BBLK* bb) const;
+
+    std::vector<BBLK*> original; // by number
+    std::vector<std::unique_ptr<NATURAL_LOOP>> loops;
+    std::vector<int> first, last;         // numbers of the walk over the dominator tree, by block
+    std::vector<NATURAL_LOOP*> innermost; // by block
+    bool split = false;
+};
+
+// The link in front of the statement that ends a block, and of the promises that belong to it: where a statement can be
+// put at the block's end.
+LIST** end_of_body(BBLK* bb);
+void put_at_end(BBLK* bb, NODE* statement);

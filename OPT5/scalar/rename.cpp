@@ -1,0 +1,3 @@
+#include "OPT5/scalar/merge.h"
+
+void rename_symbols() {}

@@ -1,0 +1,156 @@
+// Addresses that move with a loop's counter become pointers; a counter that nothing else needs goes.
+// RUN: --opt_level=2
+#include <zrun.h>
+
+int a[300], b[300];
+long m[8][8], w[64];
+struct pair { int x, y; } pairs[40];
+
+// The test is on the pointer: it meets its end exactly, also where the loop does not run.
+// FUNCTION: dot
+// HAS: s += *$O$P0 * *$O$P1
+// HAS: $O$P0 += 1
+// NOT: i
+// HAS: if (!($O$P0 == $O$P2)) goto L1
+// COUNT 1: n > 0 ? x + n : x
+int dot(const int *x, const int *y, int n) {
+    int s = 0;
+    for (int i = 0; i < n; i++) s += x[i] * y[i];
+    return s;
+}
+
+// Rows become pointers of the outer loop.
+// FUNCTION: total
+// COUNT 1: s += *$O$P0
+// COUNT 0: * 16
+// COUNT 0: i +=
+// COUNT 0: j +=
+long total(void) {
+    long s = 0;
+    for (int i = 0; i < 8; i++)
+        for (int j = 0; j < 8; j++) s += m[i][j];
+    return s;
+}
+
+// Down, by twos, with the limit met and passed.
+// FUNCTION: strides
+// COUNT 0: i -=
+// COUNT 0: i +=
+long strides(void) {
+    long s = 0;
+    for (int i = 63; i > 0; i -= 2) s = s * 3 + w[i];
+    for (int i = 1; i < 63; i += 4) s = s * 5 + w[i] * w[i + 1];
+    return s;
+}
+
+// The pointer steps where the counter does.
+// FUNCTION: chosen
+// HAS: /if .*goto/
+// HAS: $O$P0 += 2
+// HAS: k += 1
+int chosen(int n) {
+    int k = 0;
+    for (int i = 0; i < n; i++) {
+        w[k] = w[k] + i;
+        if (a[i] & 1) k++;
+    }
+    return k;
+}
+
+// Offsets from one pointer, up from the lowest.
+// FUNCTION: smooth
+// COUNT 1: *($O$P0 + 2)
+// COUNT 1: *($O$P0 + 4)
+void smooth(int n) {
+    for (int i = 1; i < n; i++) w[i] = w[i - 1] + w[i + 1];
+}
+
+// FUNCTION: members
+// COUNT 0: * 2
+void members(int n) {
+    for (int i = 0; i < n; i++) {
+        pairs[i].x = i;
+        pairs[i].y = n;
+    }
+}
+
+// It is read behind the loop.
+// FUNCTION: found
+// COUNT 1: i += 1
+int found(int key) {
+    int i;
+    for (i = 0; i < 64; i++)
+        if (w[i] == key) break;
+    return i;
+}
+
+// An unsigned counter wraps, and so does the address.
+// FUNCTION: wraps
+// COUNT 1: (long)u * 2
+long wraps(unsigned u, const long *p, int n) {
+    long s = 0;
+    do {
+        s += p[u];
+        u += 0x8000u;
+    } while (--n > 0);
+    return s;
+}
+
+// Bounded by its test it does not.
+// FUNCTION: bounded
+// COUNT 0: u +=
+long bounded(unsigned n) {
+    long s = 0;
+    for (unsigned u = 0; u < n; u++) s += w[u];
+    return s;
+}
+
+// FUNCTION: kept_volatile
+// COUNT 1: * 2
+long kept_volatile(int n) {
+    long s = 0;
+    for (volatile int i = 0; i < n; i++) s += w[i];
+    return s;
+}
+
+// A call may change it.
+// FUNCTION: kept_aliased
+// COUNT 1: * 2
+static void twice(int *i) { ++*i; }
+long kept_aliased(int n) {
+    long s = 0;
+    for (int i = 0; i < n; i++) {
+        s += w[i];
+        twice(&i);
+    }
+    return s;
+}
+
+// What is promised of a loop stands right ahead of it.
+// FUNCTION: promised
+// HAS: $O$P0 = &_w
+// HAS: /^pragma 39 MUST_ITERATE/
+// HAS: goto L2
+long promised(int n) {
+    long s = 0;
+#pragma MUST_ITERATE(2)
+    for (int i = 0; i < n; i++) s += w[i];
+    return s;
+}
+
+int main(void) {
+    for (int i = 0; i < 300; i++) a[i] = i ^ 5, b[i] = 300 - i;
+    for (int i = 0; i < 64; i++) w[i] = i * 7L, m[i / 8][i % 8] = i;
+    put_i16(dot(a, b, 30));
+    put_i16(dot(a, b, 0));
+    put_i16(dot(a, b, -3));
+    put_i32(total());
+    put_i32(strides());
+    put_i16(chosen(20));
+    smooth(30);
+    members(40);
+    put_i32(w[29] + pairs[39].x + pairs[3].y);
+    put_i16(found(203));
+    put_i32(wraps(3, w, 1) + bounded(9) + kept_volatile(9) + kept_aliased(9) + promised(4));
+    return 0;
+}

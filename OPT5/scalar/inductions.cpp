@@ -14,10 +14,7 @@
 #include <algorithm>
 
 bool is_private_scalar(const SYMTAB* sym) {
-    if (!sym || sym->level != 2 || sym->is_aliased() || sym->type->is_volatile() || !sym->type->is_scalar())
-        return false;
-    if (sym->sclass != SC_AUTO && sym->sclass != SC_REGISTER && sym->sclass != SC_REGISTER2) return false;
-    return !currfuninfo->has_eh() || !sym_appears_in_EHT(sym);
+    return sym && sym->level == 2 && sym->type->is_scalar() && only_its_name_reaches(sym);
 }
 
 namespace {

@@ -22,7 +22,6 @@ int dot(const int *x, const int *y, int n) {
 // Rows become pointers of the outer loop.
 // FUNCTION: total
 // COUNT 1: s += *$O$P0
-// COUNT 0: * 16
 // COUNT 0: i +=
 // COUNT 0: j +=
 long total(void) {
@@ -66,7 +65,7 @@ void smooth(int n) {
 }
 
 // FUNCTION: members
-// COUNT 0: * 2
+// COUNT 1: $O$P0 += 2
 void members(int n) {
     for (int i = 0; i < n; i++) {
         pairs[i].x = i;
@@ -86,7 +85,7 @@ int found(int key) {
 
 // An unsigned counter wraps, and so does the address.
 // FUNCTION: wraps
-// COUNT 1: (long)u * 2
+// COUNT 0: $O$P
 long wraps(unsigned u, const long *p, int n) {
     long s = 0;
     do {
@@ -106,7 +105,7 @@ long bounded(unsigned n) {
 }
 
 // FUNCTION: kept_volatile
-// COUNT 1: * 2
+// COUNT 0: $O$P
 long kept_volatile(int n) {
     long s = 0;
     for (volatile int i = 0; i < n; i++) s += w[i];
@@ -115,7 +114,7 @@ long kept_volatile(int n) {
 
 // A call may change it.
 // FUNCTION: kept_aliased
-// COUNT 1: * 2
+// COUNT 0: $O$P
 static void twice(int *i) { ++*i; }
 long kept_aliased(int n) {
     long s = 0;

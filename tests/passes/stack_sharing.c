@@ -32,7 +32,7 @@ void fill(int *p, int n, int by) {
 int setjmp(int *environment);
 
 // FUNCTION: blocks
-// HAS: 6 $O$O1: union U2_11, class 1, qualifiers 0000, 832 bits aligned to 32, level 2
+// HAS: /\d \$O\$O1: union U2_11, class 1, qualifiers 0000, 832 bits aligned to 32/
 // HAS: /_fill\(&outer/
 // HAS: /other\.l = 77/
 int blocks(int n) {

@@ -130,6 +130,9 @@ public:
     std::unique_ptr<SNMAP> snmap; // the values in force during constant propagation; never null
     OVERLAP* overlaps = nullptr;
     SYMTAB* stack_union = nullptr; // the variable that locals of disjoint scopes lie in over each other, or null
+    // The step that lays locals of disjoint scopes over each other is behind. Until then no pass moves a load of memory to
+    // where its scope may have ended, for the object would share its place with one that lives there.
+    bool stack_is_laid_out = false;
     uint32_t name_counter = 0;
     bool address_taken_local = false, has_bitfield_access = false, has_cqual10_name = false;
     bool no_calls = true; // no CALL or UCALL was made in this function

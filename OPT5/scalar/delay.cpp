@@ -20,6 +20,12 @@ namespace {
 
 constexpr size_t MAX_PASSED = 16; // statements that an assignment is moved over
 
+bool reads_memory(const NODE* t) {
+    return tree_contains_matching_node(t, [](const NODE* n) {
+        return n->op == UMULT || n->op == STREF || n->op == STDOT || (n->op == NAME && !n->type->is_scalar());
+    });
+}
+
 class DELAY {
 public:
     bool run() {
@@ -68,6 +74,7 @@ private:
         if (t->op != ASG || t->left->op != NAME || tree_is_arg_prolog(t)) return nullptr;
         const int bit = live_index(t->left->u.sym);
         if (bit < 0 || reads[static_cast<size_t>(bit)] != 1 || tree_has_side_effects(t->right)) return nullptr;
+        if (!currfuninfo->stack_is_laid_out && reads_memory(t->right)) return nullptr;
         BBLK* target = nullptr;
         for (const EDGE* e = bb->successors; e; e = e->rest) {
             const BITVEC* in = e->first->live_sets[LIVE_IN];

@@ -5,8 +5,8 @@
 // record's variables stand side by side and ahead of what its children need, the children lie over each other. What
 // the outermost block declares lives as long as the function and stays out.
 //
-// Sound only while no access has left its scope. That holds here, for nothing ahead of this step moves a load or a
-// store; a variable that is named outside of its scope all the same stays out. Behind this step the members are parts
+// Sound only while no access has left its scope: ahead of this step no pass moves a load or a store of memory
+// (`FUNINFO::stack_is_laid_out`), and a variable that is named outside of its scope all the same stays out. Behind this step the members are parts
 // of one object to every pass, at offsets that overlap, and the rule on types does not part accesses to what the union
 // holds (`lvalues_may_be_aliased`).
 #include "OPT5/scalar/stack_sharing.h"
@@ -441,9 +441,12 @@ void SHARING::run() {
 
 void build_stack_sharing_type() {
     LS* outermost = LS::level_2_scope();
-    if (!outermost || !outermost->first_child || !currfuninfo->bb_list) return;
-    if (print_debug && fdebug) currfuninfo->ls_root->print(fdebug);
-    SHARING().run();
-    init_stack_sharing();
-    reset_alias_info();
+    const bool has_scopes = outermost && outermost->first_child && currfuninfo->bb_list;
+    if (has_scopes && !currfuninfo->stack_is_laid_out) {
+        if (print_debug && fdebug) currfuninfo->ls_root->print(fdebug);
+        SHARING().run();
+        init_stack_sharing();
+        reset_alias_info();
+    }
+    currfuninfo->stack_is_laid_out = true;
 }

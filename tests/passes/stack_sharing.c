@@ -159,7 +159,27 @@ int returned_to(int n) {
     return r;
 }
 
+// What one scope holds is read before another scope's array takes its place, not on the way that needs it.
+int late(int wanted, int v) {
+    int x, y;
+    {
+        int first[9];
+        first[v & 7] = v;
+        first[wanted & 7] = v + 2;
+        x = first[wanted & 7];
+    }
+    {
+        int second[9];
+        second[v & 7] = 5;
+        second[wanted & 7] = 6;
+        y = second[wanted & 7];
+    }
+    if (wanted) return x + y;
+    return y;
+}
+
 int main(void) {
+    put_i16(late(3, 10));
     for (int i = 0; i < 5; i++) {
         put_i16(blocks(i));
         put_i16(types(i));

@@ -314,11 +314,13 @@ const NODE* TEST_OUTCOMES::constant_assignment(const BBLK* pred) {
     if (!variable) return nullptr;
     const NODE* control = control_of(pred)->first;
     if (control->op != BRANCH && (control->op != IF || statement_may_change(control->left, reads))) return nullptr;
-    for (const LIST* s : statements_back(pred)) {
-        if (assigns_constant(s->first, variable)) return s->first;
-        if (statement_may_change(s->first, reads)) return nullptr;
-    }
-    return nullptr;
+    const auto& back = statements_back(pred);
+    const auto asg =
+        std::find_if(back.begin(), back.end(), [this](const LIST* s) { return assigns_constant(s->first, variable); });
+    if (asg == back.end()) return nullptr;
+    const bool is_last =
+        std::none_of(back.begin(), asg, [this](const LIST* s) { return statement_may_change(s->first, reads); });
+    return is_last ? (*asg)->first : nullptr;
 }
 
 std::optional<bool> TEST_OUTCOMES::behind_constant(const BBLK* pred) {

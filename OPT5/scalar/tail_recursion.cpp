@@ -3,6 +3,9 @@
 // The frame of the caller is gone then while the callee runs, so no address of anything in it may be known to anyone,
 // and nothing may depend on which frame it is: no handler, no saved environment, no part of the argument list beyond
 // the named parameters. `restrict` speaks of one activation; a pointer that bears it keeps its value.
+//
+// A call is the last act too where it is an arm of the conditional value that is returned, and, of a function that
+// returns truth values alone, where the rest of `a && b` or `a || b` is the call: such a return is taken apart first.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
@@ -58,12 +61,27 @@ bool reads_parameter_record(const NODE* t) {
     return tree_contains_matching_node(t, [](const NODE* n) { return n->op == NAME && n->u.sym->level == 1; });
 }
 
+bool calls_itself(const NODE* t) { return op_is_call(t->op) && get_callee_for_call(t) == currfunc; }
+
+// Whether a value is 0 or 1, if what the current function returns is.
+bool is_truth_value(const NODE* t) {
+    switch (t->op) {
+    case ICON: return t->u.lval.is_zero() || t->u.lval == INT65(1);
+    case ANDAND:
+    case OROR:
+    case EXCLAIM: return true;
+    case QUEST: return is_truth_value(t->right->left) && is_truth_value(t->right->right);
+    default: return op_is_int_compare(t->op) || op_is_float_compare(t->op) || calls_itself(t);
+    }
+}
+
 class TAIL_RECURSION {
 public:
     void run() {
         FUNINFO* f = currfuninfo;
         if (opt_level() < 2 || !f->bb_list || f->has_eh() || !find_calls() || !frame_is_private()) return;
-        bool changed = false;
+        for (BBLK* bb : conditional) take_apart(bb);
+        bool changed = !conditional.empty();
         for (BBLK* bb : calls) changed |= convert(bb);
         if (!changed) return;
         sym_split(f);
@@ -72,8 +90,6 @@ public:
     }
 
 private:
-    static bool calls_itself(const NODE* t) { return op_is_call(t->op) && get_callee_for_call(t) == currfunc; }
-
     static bool leads_only_to_exit(const BBLK* bb) {
         const BBLK* to = bb->successors && !bb->successors->rest ? bb->successors->first : nullptr;
         for (int steps = 0; to && to != currfuninfo->exit_bb; ++steps) {
@@ -96,11 +112,94 @@ private:
         return calls_itself(before->first) ? before : nullptr;
     }
 
-    bool find_calls() {
-        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            if (tail_call(bb)) calls.push_back(bb);
-        return !calls.empty();
+    static NODE* returned_value(const BBLK* bb) {
+        NODE* t = bb->branch();
+        return t && t->op == RETURN ? t->right : nullptr;
     }
+
+    bool find_calls() {
+        returns_truth = currfunc->type->getr(TYPE::tpk_func)->return_type()->is_int();
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            if (const NODE* value = returned_value(bb)) returns_truth &= is_truth_value(value);
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            const NODE* value = returned_value(bb);
+            if (tail_call(bb))
+                calls.push_back(bb);
+            else if (value && ends_in_call(value))
+                conditional.push_back(bb);
+        }
+        return !calls.empty() || !conditional.empty();
+    }
+
+    // ---- Conditional values
+
+    // A test of a truth value against zero is the value.
+    NODE* as_truth_value(NODE* t) const {
+        const bool is_test = t->op == NEQ && t->right->op == ICON && t->right->u.lval.is_zero();
+        if (is_test && calls_itself(t->left)) {
+            NODE* call = t->left;
+            erase_tree(t->right);
+            erase_node(t);
+            return call;
+        }
+        return is_truth_value(t) ? t : make_boolean(t, nullptr);
+    }
+
+    bool ends_in_call(const NODE* t) const {
+        if (calls_itself(t)) return true;
+        if (t->op == QUEST) return ends_in_call(t->right->left) || ends_in_call(t->right->right);
+        if (!returns_truth) return false;
+        const bool is_test = t->op == NEQ && t->right->op == ICON && t->right->u.lval.is_zero();
+        return is_test ? calls_itself(t->left) : (t->op == ANDAND || t->op == OROR) && ends_in_call(t->right);
+    }
+
+    // A return of `c ? a : b`, `c && a` or `c || b` becomes a test of c and two returns; a call stands bare.
+    void take_apart(BBLK* bb) {
+        LIST* cell = bb->last_statement();
+        NODE *ret = cell->first, *value = ret->right, *condition = value->left, *yes = value->right, *no = nullptr;
+        TYPE* type = value->type;
+        switch (value->op) {
+        case QUEST:
+            yes = value->right->left;
+            no = value->right->right;
+            erase_node(value->right);
+            break;
+        case ANDAND:
+            yes = as_truth_value(yes);
+            no = mk_ICON(INT65(0), type);
+            break;
+        case OROR:
+            no = as_truth_value(yes);
+            yes = mk_ICON(INT65(1), type);
+            break;
+        default:
+            ret->right = as_truth_value(value);
+            if (tail_call(bb)) calls.push_back(bb);
+            return;
+        }
+        erase_node(value);
+        ret->right = nullptr;
+        BBLK *const on_no = block_of_return(bb, ret, no), *const on_yes = block_of_return(bb, ret, yes);
+        while (bb->successors) disconnect(bb, bb->successors->first);
+        cell->first = mk_IF(condition, mk_LABELREF_to_bb(on_yes), mk_LABELREF_to_bb(on_no), ret->ls);
+        erase_tree(ret);
+        for (BBLK* arm : {on_yes, on_no}) connect(bb, arm);
+        for (BBLK* arm : {on_yes, on_no})
+            if (tail_call(arm))
+                calls.push_back(arm);
+            else if (ends_in_call(returned_value(arm)))
+                take_apart(arm);
+    }
+
+    static BBLK* block_of_return(BBLK* bb, const NODE* ret, NODE* value) {
+        NODE* t = copy_tree(ret);
+        t->right = value;
+        BBLK* arm = insert_new_bb(-1, bb, mkelist(t, nullptr, bb->last_statement()->psn));
+        for (EDGE* e = bb->successors; e; e = e->rest) connect(arm, e->first);
+        return arm;
+    }
+
+    // ---- The frame
 
     bool frame_is_private() {
         const TYPE* type = currfunc->type->getr(TYPE::tpk_func);
@@ -244,6 +343,8 @@ private:
 
     std::vector<PARAMETER> parms;
     std::vector<BBLK*> calls;
+    std::vector<BBLK*> conditional; // return what is an own call on some way
+    bool returns_truth = false;
     BBLK* start_bb = nullptr;
 };
 

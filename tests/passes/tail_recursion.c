@@ -61,6 +61,37 @@ void no_parameters(void) {
     if (port++ < 5) no_parameters();
 }
 
+// FUNCTION: chosen
+// COUNT 0: _chosen(
+// COUNT 2: tail recursive call occurs here
+long chosen(int n, int sum) { return n > 9 ? chosen(n - 7, sum + 1) : n ? chosen(n - 1, sum + n) : (long)sum; }
+
+struct list {
+    int value;
+    struct list* next;
+};
+// FUNCTION: is_member
+// COUNT 0: _is_member(
+int is_member(const struct list* l, int v) { return l && (l->value == v || is_member(l->next, v)); }
+
+// FUNCTION: all_positive
+// COUNT 1: _all_positive(
+// COUNT 2: tail recursive call occurs here
+int all_positive(const int* p, int n) {
+    if (n == 0) return 1;
+    if (n == 1) return all_positive(p, 2 * n - 2) != 0 && *p > 0;
+    if (n == 2 && *p > 0) return all_positive(p + 1, n - 1) != 0;
+    return *p > 0 && all_positive(p + 1, n - 1) != 0;
+}
+
+// What the calls return isn't what their truth is.
+// FUNCTION: first_above
+// COUNT 1: _first_above(
+int first_above(int n, int limit) {
+    if (n > limit) return n;
+    return n != limit && first_above(n + 2, limit);
+}
+
 // FUNCTION: not_last
 // COUNT 1: _not_last(
 int not_last(int n) {
@@ -126,6 +157,11 @@ int main(void) {
     put_i16(with_effects(5, 6, 3));
     no_parameters();
     put_i16(port);
+    put_i32(chosen(30, 2));
+    struct list one = {1, 0}, two = {2, &one};
+    put_i16(is_member(&two, 1) + 2 * is_member(&two, 2) + 4 * is_member(&two, 3));
+    put_i16(all_positive(a, 2) + 2 * all_positive((int[]){1, 0}, 2) + 4 * all_positive((int[]){1, 1, 2}, 3));
+    put_i16(first_above(1, 6) + 10 * first_above(2, 6));
     put_i16(not_last(5));
     put_i32(converted(2));
     put_i16(by_address(4, 0));

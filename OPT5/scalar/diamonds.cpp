@@ -10,8 +10,8 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/minmax.h"
 #include "OPT5/simp/simp.h"
-#include "OPT5/target/bif.h"
 
 #include <utility>
 
@@ -30,11 +30,11 @@ bool rhs_may_need_guard_in_lhs(NODE* rhs) {
         case MOD:
         case CALL:
         case UCALL:
-        case ICALL:
         case UICALL:
         case MCALL:
         case UMCALL:
         case QUEST: guard = true; break;
+        case ICALL: guard = guard || !is_minmax_call(t); break;
         default: break;
         }
     });
@@ -50,83 +50,7 @@ bool is_plain_target(const NODE* lvalue) {
     return lvalue->op == NAME && lvalue->type->is_scalar() && !lvalue_is_volatile(lvalue);
 }
 
-// ---- Minimum and maximum
-
-const char* minmax_name(TYPE* type, bool maximum) {
-    if (type->is_float()) {
-        static const char* const names[3][2] = {{"FMIN", "FMAX"}, {"DMIN", "DMAX"}, {"LDMIN", "LDMAX"}};
-        const int row = type->fkind() == TYPE::fk_float ? 0 : type->fkind() == TYPE::fk_double ? 1 : 2;
-        return names[row][maximum];
-    }
-    static const char* const names[3][2][2] = {{{"MIN", "MAX"}, {"MINU", "MAXU"}},
-                                               {{"LMIN", "LMAX"}, {"LMINU", "LMAXU"}},
-                                               {{"LLMIN", "LLMAX"}, {"LLMINU", "LLMAXU"}}};
-    if (!type->is_int()) return nullptr;
-    const int row = type->size == 16 ? 0 : type->size == 32 ? 1 : type->size == 64 ? 2 : -1;
-    return row < 0 ? nullptr : names[row][type->is_unsigned()][maximum];
-}
-
-// Whether a compare holds where its left side is the smaller (1) or the larger (0); -1 for any other. Of floats only
-// the strict compares, which an equal pair and a NaN fail.
-int order_of(int op, TYPE* type) {
-    switch (op) {
-    case FLT: return 1;
-    case FGT: return 0;
-    case LT:
-    case LE: return type->is_unsigned() ? -1 : 1;
-    case GT:
-    case GE: return type->is_unsigned() ? -1 : 0;
-    case ULT:
-    case ULE: return type->is_unsigned() ? 1 : -1;
-    case UGT:
-    case UGE: return type->is_unsigned() ? 0 : -1;
-    default: return -1;
-    }
-}
-
-// Whether the arm `value` is what the compare's side `bound` is. Of integers the neighbour across the border serves as
-// well: `y >= 8 ? 7 : y` is the smaller of y and 7, as `y > 7 ? 7 : y` is.
-bool is_bound(const NODE* value, const NODE* bound, int op, bool on_the_right) {
-    if (trees_are_congruent(value, bound, false)) return true;
-    if (value->op != ICON || bound->op != ICON || !on_the_right || !equiv_mtypes(value->type, bound->type))
-        return false;
-    const INT65 v = value->u.lval, b = bound->u.lval;
-    switch (op) {
-    case LT:
-    case GE:
-    case ULT:
-    case UGE: return v == b - INT65(1);
-    case LE:
-    case GT:
-    case ULE:
-    case UGT: return v == b + INT65(1);
-    default: return false;
-    }
-}
-
-// The call of the target's built-in for `c ? a : b` where c compares a with b, or null. Of a floating pair the second
-// argument is the one that must be smaller (larger) to win, so that a NaN and zeros of both signs choose as before.
-NODE* make_minmax(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
-    if (!c->left || !c->right || !equiv_mtypes(c->left->type, type) || !equiv_mtypes(c->right->type, type))
-        return nullptr;
-    int op = c->op;
-    if (op == FGEN || op == FLEN) {
-        op = boolean_inv[op];
-        std::swap(a, b);
-    }
-    const int less = order_of(op, type);
-    if (less < 0) return nullptr;
-    const bool straight = is_bound(a, c->left, op, false) && is_bound(b, c->right, op, true);
-    const bool crossed = is_bound(a, c->right, op, true) && is_bound(b, c->left, op, false);
-    if (!straight && !crossed) return nullptr;
-    const bool maximum = (less == 1) == crossed;
-    const char* generic = minmax_name(type, maximum);
-    const BIF* bif = generic ? find_target_BIF_descriptor(generic) : nullptr;
-    if (!bif) return nullptr;
-    // The winner on the condition's side comes second.
-    NODE* args = maketree(COMMA, copy_tree(b), copy_tree(a), tp->int_t);
-    return fix_BIF_types(mk_ICALL(bif->name.c_str(), args, type));
-}
+// ---- Values
 
 bool is_truth_value(const NODE* t, long value) {
     return t->op == ICON && t->type->is_int() && t->u.lval == INT65(value);

@@ -4,6 +4,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/minmax.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
@@ -72,11 +73,15 @@ NODE* simp_strict_ternary_ICALL(NODE* t, struct LOOP* loop) {
     return r->op == QUEST && r->right->op == COLON && !has_lazy_parts ? make_strict_ternary_ICALL(r) : r;
 }
 
-// The arm that a known test takes.
+// The arm that a known test takes. The other one was computed as well: its effects stay, the first arm's before the
+// second.
 NODE* eval_qc_ICALL(NODE* t) {
-    if (!is_strict_ternary_ICALL(t) || !is_icon(argument(t, 0)) || !is_pure(t)) return t;
-    const bool then = !argument(t, 0)->u.lval.is_zero();
-    return replace_by(t, copy_tree(argument(t, then ? 1 : 2)));
+    if (!is_strict_ternary_ICALL(t)) return t;
+    NODE *test = argument(t, 0), *a = argument(t, 1), *b = argument(t, 2);
+    const bool then = is_icon(test) && !test->u.lval.is_zero();
+    if (!is_icon(test) || (then && !is_pure(b) && !is_steady_leaf(a))) return t;
+    NODE* effects = peel_for_effect(copy_tree(then ? b : a));
+    return mk_COMMAOP(effects, replace_by(t, copy_tree(then ? a : b)));
 }
 
 // ---- Marks
@@ -193,6 +198,9 @@ const HOOK hooks[] = {
     {"SORREL_ITOLL", simp_ITOLL_ICALL, nullptr},
 };
 
+constexpr const char* extrema[] = {"MIN", "LMIN", "LLMIN", "MINU", "LMINU", "LLMINU",
+                                   "MAX", "LMAX", "LLMAX", "MAXU", "LMAXU", "LLMAXU"};
+constexpr const char* absolutes[] = {"__abs16_sat", "ETSI_ABS_S", "ETSI_L_ABS"};
 constexpr const char* accesses[] = {"MEM2", "MEM4", "MEM8", "MEMD8"};
 
 } // namespace
@@ -200,6 +208,8 @@ constexpr const char* accesses[] = {"MEM2", "MEM4", "MEM8", "MEMD8"};
 void install_BIF_simplifiers() {
     if (!find_BIF_descriptor("quest$colon")) return; // a start without descriptors
     for (const HOOK& h : hooks) set_BIF_hooks(h.name, h.simplify, h.evaluate);
+    for (const char* name : extrema) set_BIF_hooks(name, simp_minmax_ICALL, nullptr);
+    for (const char* name : absolutes) set_BIF_hooks(name, simp_absolute_ICALL, nullptr);
     for (const char* access : accesses)
         for (const char* suffix : {"", "_CONST"}) {
             set_BIF_hooks((std::string("SORREL_") + access + suffix).c_str(), simp_NONALIGN_ICALL, nullptr);

@@ -5,7 +5,7 @@
 // arms in their order. A cast that the operand's bits or the use of the result make idle is gone.
 
 #include "OPT5/simp/algebra.h"
-#include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/minmax.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -191,9 +191,9 @@ NODE* ordered_arms(NODE* t, struct LOOP* loop) {
 }
 
 const RULE select_rules[] = {
-    constant_condition, equal_arms,   condition_without_opposite, arm_by_equality, arm_by_truth,
-    constant_arms,      logical_arms, condition_asked_again,      absolute_value,  ordered_arms,
-    common_cast_outward};
+    constant_condition, equal_arms,         condition_without_opposite, arm_by_equality, arm_by_truth,
+    constant_arms,      logical_arms,       condition_asked_again,      absolute_value,  minmax_of_QUEST,
+    ordered_arms,       common_cast_outward};
 
 } // namespace
 

@@ -408,7 +408,8 @@ BITS EVALUATOR::call(const NODE* t) {
     return wrap(r & 1 ? r : r >> 8 & 7, form_of(t->type));
 }
 
-// A conditional that computes both arms, and marks that give their operand.
+// A conditional that computes both arms, marks that give their operand, minima and maxima. Of the latter the second
+// argument wins where it is strictly less, or greater.
 BITS EVALUATOR::intrinsic(const NODE* t) {
     const FORM own = form_of(t->type);
     const std::string name = t->u.name;
@@ -419,7 +420,20 @@ BITS EVALUATOR::intrinsic(const NODE* t) {
         return holds ? x : y;
     }
     if (name == "DONOTCSE") return convert(eval(t->left), form_of(t->left->type), own);
-    return fail();
+    const std::size_t minimum = name.find("min"), maximum = name.find("max");
+    if (t->left->op != COMMA) { // an absolute value that saturates
+        const BITS v = convert(eval(t->left), form_of(t->left->type), own),
+                   most = wrap(~BITS(0) >> (65 - own.bits), own);
+        if (name != "__abs16_sat") return fail();
+        return static_cast<int64_t>(v) >= 0 ? v : wrap(-v, own) == v ? most : -v;
+    }
+    if (minimum == std::string::npos && maximum == std::string::npos) return fail();
+    const NODE *first = t->left->left, *second = t->left->right;
+    const BITS a = convert(eval(first), form_of(first->type), own),
+               b = convert(eval(second), form_of(second->type), own);
+    const bool less = own.is_float ? as_double(b) < as_double(a) : static_cast<int64_t>(b) < static_cast<int64_t>(a);
+    const bool greater = own.is_float ? as_double(b) > as_double(a) : static_cast<int64_t>(b) > static_cast<int64_t>(a);
+    return (minimum != std::string::npos ? less : greater) ? b : a;
 }
 
 void EVALUATOR::copy_record(const NODE* t) {

@@ -242,7 +242,25 @@ NODE* GENERATOR::choice_by_value(TYPE* type, int depth) {
     return binary(QUEST, binary(op, x, limit, tp->int_t), arms, type);
 }
 
+// The smaller or the larger by the target's instruction, or an absolute value; null where it has none for the type.
+NODE* GENERATOR::extremum(TYPE* type, int depth) {
+    const bool maximum = random.pick(2) != 0;
+    if (type == tp->int_t && random.one_in(6)) return mk_ICALL("__abs16_sat", operand(type, depth), type);
+    const char* name = type == tp->int_t      ? (maximum ? "__max" : "__min")
+                       : type == tp->long_t   ? (maximum ? "__lmax" : "__lmin")
+                       : type == tp->llong_t  ? (maximum ? "__llmax" : "__llmin")
+                       : type == tp->float_t  ? (maximum ? "__fmax" : "__fmin")
+                       : type == tp->double_t ? (maximum ? "__fmax64" : "__fmin64")
+                                              : nullptr;
+    if (!name) return nullptr;
+    NODE *a = operand(type, depth), *b = random.one_in(2) ? constant(type) : operand(type, depth);
+    if (random.one_in(3)) std::swap(a, b);
+    return mk_ICALL(name, binary(COMMA, a, b, tp->int_t), type);
+}
+
 NODE* GENERATOR::choice(TYPE* type, int depth) {
+    if (random.one_in(4))
+        if (NODE* t = extremum(type, depth)) return t;
     if (!type->is_pointer() && (type->is_float() || computes(type)) && random.one_in(2))
         return choice_by_value(type, depth);
     NODE* a = operand(type, depth);

@@ -67,6 +67,7 @@ private:
     NODE* floating(TYPE* type, int depth);
     NODE* pointer(TYPE* type, int depth);
     NODE* choice(TYPE* type, int depth);
+    NODE* extremum(TYPE* type, int depth);
     NODE* choice_by_value(TYPE* type, int depth);
     NODE* effect(TYPE* type, int depth);
     NODE* assignment(NODE* place, int depth);

@@ -7,6 +7,7 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
 #include "UTIL/safemem.h"
 
 #include <string>
@@ -16,12 +17,16 @@ namespace treecheck {
 namespace {
 
 void start_packages() {
-    if (tp) return;
-    TYPE_PKG::abi = 1;
-    tp = new TYPE_PKG;
-    TYPE_PKG::init_type_pkg(tp);
-    init_opcode_tables();
-    init_types();
+    if (!tp) {
+        TYPE_PKG::abi = 1;
+        tp = new TYPE_PKG;
+        TYPE_PKG::init_type_pkg(tp);
+        init_opcode_tables();
+        init_types();
+    }
+    cpu_version = 28; // with all built-in functions that there are
+    float_support = 11;
+    is_fpu64 = true;
     init_BIF_descriptors();
 }
 

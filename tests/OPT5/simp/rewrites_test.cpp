@@ -4,6 +4,8 @@
 #include "expression_parser.h"
 
 #include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
 
 #include <fstream>
 
@@ -11,7 +13,15 @@ using namespace test_trees;
 
 namespace {
 
-class Rewrites : public Trees {};
+class Rewrites : public Trees {
+protected:
+    static void SetUpTestSuite() {
+        start();
+        init_target();
+        init_BIF_descriptors();
+        init_simplifier();
+    }
+};
 
 std::string trimmed(const std::string& s) {
     const std::size_t first = s.find_first_not_of(' '), last = s.find_last_not_of(' ');

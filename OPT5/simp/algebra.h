@@ -30,8 +30,10 @@ NODE* simp_RECIP(NODE* t, struct LOOP* loop);
 // ---- Truth values
 NODE* simp_relop(NODE* t, struct LOOP* loop);
 NODE* simp_QUEST(NODE* t, struct LOOP* loop);
+// Of an integer operator on a conditional of constants and a constant: the conditional of the results.
+NODE* apply_to_constant_arms(NODE* t, struct LOOP* loop);
 NODE* simp_EXCLAIM(NODE* t, struct LOOP* loop);
-NODE* simp_OROR(NODE* t, struct LOOP* loop);     // and ANDAND
+NODE* simp_OROR(NODE* t, struct LOOP* loop); // and ANDAND
 
 // ---- Casts
 NODE* simp_SCONV(NODE* t, struct LOOP* loop);

@@ -270,6 +270,21 @@ NODE* negate_sum(NODE* t, struct LOOP* loop) {
     return nullptr;
 }
 
+// -(x < 0) is x >> (width - 1).
+NODE* negated_sign_test(NODE* t, struct LOOP* loop) {
+    NODE* test = t->left->op == SCONV ? t->left->left : t->left;
+    if (test->op != LT || !is_icon(test->right, INT65(0)) || !same_integers(test->left->type, test->right->type) ||
+        !is_signed(test->left->type) || test->left->type->size < tp->int_t->size)
+        return nullptr;
+    TYPE *type = t->type->stqs(), *from = test->left->type->stqs();
+    NODE* x = test->left;
+    if (test != t->left) erase_node(t->left);
+    erase_node(test->right);
+    erase_node(test);
+    erase_node(t);
+    return coerced(type, made(SRL, x, mk_ICON(INT65(static_cast<long>(from->size) - 1), tp->int_t), from, loop), loop);
+}
+
 NODE* complement_sum(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     if (is_unary(inner, UMINUS)) { // ~-x is x - 1
@@ -288,6 +303,15 @@ NODE* complement_sum(NODE* t, struct LOOP* loop) {
         set_icon(inner->left, ~inner->left->u.lval);
         std::swap(inner->left, inner->right);
         inner->op = PLUS;
+        erase_node(t);
+        return simp_node(inner, loop);
+    }
+    // ~(~x + y) is x - y
+    if (is_node(inner, PLUS) && (is_unary(inner->left, NOTB) ||
+                                 (is_unary(inner->right, NOTB) && is_pure(inner->left) && is_pure(inner->right)))) {
+        if (!is_unary(inner->left, NOTB)) std::swap(inner->left, inner->right);
+        inner->left = take_left(inner->left);
+        inner->op = MINUS;
         erase_node(t);
         return simp_node(inner, loop);
     }
@@ -325,6 +349,7 @@ NODE* simp_unary(NODE* t, struct LOOP* loop) {
         return coerce_to_type(type, operand);
     }
     if (NODE* r = t->op == UMINUS ? negate_sum(t, loop) : complement_sum(t, loop)) return r;
+    if (NODE* r = t->op == UMINUS ? negated_sign_test(t, loop) : nullptr) return r;
     return simp_by_known_bits(t);
 }
 

@@ -46,25 +46,27 @@ NODE* narrow_under_cast(NODE* t, struct LOOP* loop) {
     return t->left == operand ? nullptr : simp_node(t, loop);
 }
 
-// An operator on bits, or on unsigned numbers, whose operands come from the narrower type: computed there.
+// An operator whose result is cut to a narrower type: computed there. One operand of an operator on bits may be any
+// with a constant beside it; other operators, which wrap in the narrower type, compute in its unsigned form.
 NODE* compute_narrow(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     TYPE *type = t->type->stqs(), *wide = inner->type;
     if (!is_integer(type) || type->size < tp->int_t->size || type->size >= wide->size) return nullptr;
     const bool bitwise = inner->op == ANDB || inner->op == ORB || inner->op == XORB;
     const bool wraps = inner->op == PLUS || inner->op == MINUS || inner->op == MULT;
-    if ((!bitwise && !(wraps && type->is_unsigned())) || !operands_have_type(inner)) return nullptr;
+    if ((!bitwise && !wraps) || !operands_have_type(inner)) return nullptr;
     auto comes_from_below = [&](const NODE* n) {
         return is_icon(n) || (n->op == SCONV && is_integer(n->left->type) && n->left->type->size <= type->size &&
                               !is_bitfield_access(n->left));
     };
-    if (!comes_from_below(inner->left) || !comes_from_below(inner->right)) return nullptr;
-    auto narrowed = [&](NODE* n) { return coerced(type, n, loop); };
-    inner->left = narrowed(inner->left);
-    inner->right = narrowed(inner->right);
-    inner->type = type;
+    const bool left = comes_from_below(inner->left), right = comes_from_below(inner->right);
+    if (!right || (!left && !(bitwise && is_icon(inner->right)))) return nullptr;
+    TYPE* computed = bitwise || !is_signed(type) ? type : tp->mk_unsigned(type);
+    inner->left = coerced(computed, inner->left, loop);
+    inner->right = coerced(computed, inner->right, loop);
+    inner->type = computed;
     erase_node(t);
-    return simp_node(inner, loop);
+    return coerced(type, simp_node(inner, loop), loop);
 }
 
 // Between numbers and floating point: casts on the way that lose nothing.

@@ -216,6 +216,10 @@ NODE* test_against_zero(NODE* t, struct LOOP* loop) {
         t->right = take_right(inner);
         return simp_node(t, loop);
     }
+    if (is_unary(inner, ABS)) {
+        t->left = take_left(inner);
+        return simp_node(t, loop);
+    }
     // x % 2^k == 0: the low bits, whatever the sign
     if (is_node_with_icon(inner, MOD) && log2_of(inner->right) > 0) {
         inner->op = ANDB;
@@ -328,10 +332,27 @@ NODE* compare_uncast(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
+// (x & mask) == c with all bits of a narrower unsigned type: x in that type.
+NODE* compare_low_bits(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    if (!is_equality(t) || !is_icon(t->right) || !is_node_with_icon(inner, ANDB)) return nullptr;
+    for (TYPE* narrow : {tp->uint_t, tp->ulong_t}) {
+        if (narrow->size >= inner->type->size || bits_of(inner->right) != mask_of(narrow)) continue;
+        if ((bits_of(t->right) & ~mask_of(narrow)) != 0) return nullptr; // decided by the bits
+        NODE* c = mk_ICON(t->right->u.lval, narrow);
+        erase_node(t->right);
+        erase_node(inner->right);
+        t->right = c;
+        t->left = coerced(narrow, take_left(inner), loop);
+        return simp_node(t, loop);
+    }
+    return nullptr;
+}
+
 const RULE compare_rules[] = {
     decide,           compare_truth_value, compare_single_bit, order_at_the_end, move_constant_across,
     undo_on_constant, test_against_zero,   compare_computed,   compare_arms,     cancel_common_term,
-    undo_on_both,     compare_uncast};
+    undo_on_both,     compare_low_bits,    compare_uncast};
 
 // ---- Pointers
 bool is_null(const NODE* t) {

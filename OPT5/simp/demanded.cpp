@@ -25,6 +25,9 @@ public:
         case PLUS:
         case MINUS: return operands_have_type(t) ? sum(t, up_to_highest(mask), levels) : t;
         case MULT: return operands_have_type(t) ? both(t, up_to_highest(mask), levels) : t;
+        case ABS:
+            if (mask != 1 || !operand_has_type(t)) return t; // the lowest bit is the same of either sign
+            return narrow(take_left(t), mask, levels - 1);
         case UMINUS: return operand_has_type(t) ? left_only(t, up_to_highest(mask), levels) : t;
         case SLL:
         case SRL: return shift(t, mask, levels);

@@ -50,9 +50,18 @@ bool reciprocal(const simul_fval& c, TYPE* type, simul_fval* r) {
     return !fp_error && f_eq(&product, &one) && is_power_of_2(c);
 }
 
+// -x * -y and -x / -y are exact without the signs.
+bool drop_two_negations(NODE* t) {
+    if (!is_negation(t->left, t->type) || !is_negation(t->right, t->type)) return false;
+    t->left = take_left(t->left);
+    t->right = take_left(t->right);
+    return true;
+}
+
 } // namespace
 
 NODE* simp_float_MULT(NODE* t, struct LOOP* loop) {
+    if (operands_are(t) && drop_two_negations(t)) return simp_node(t, loop);
     if (!is_fcon(t->right) || !operands_are(t)) return t;
     const simul_fval& c = *FCON_value_of_fp_constant(t->right);
     if (f_is_nan(&c)) {
@@ -72,6 +81,7 @@ NODE* simp_float_MULT(NODE* t, struct LOOP* loop) {
 }
 
 NODE* simp_float_DIV(NODE* t, struct LOOP* loop) {
+    if (operands_are(t) && drop_two_negations(t)) return simp_node(t, loop);
     if (t->right->op != FCON || !operands_are(t)) return t;
     simul_fval r;
     if (!reciprocal(*t->right->u.fval, t->type, &r)) return t;
@@ -109,8 +119,88 @@ NODE* simp_float_unary(NODE* t) {
     return coerce_to_type(type, take_left(take_left(t)));
 }
 
+namespace {
+
+// Whether the format has every number of the integer type.
+bool holds_exactly(const TYPE* format, const TYPE* type) {
+    const uint64_t digits = format->size > 32 ? 53 : 24;
+    return is_integer(type) && type->size - (is_signed(type) ? 1 : 0) <= digits;
+}
+
+// -x rel -y and -x rel c: exact, with the sides exchanged.
+bool compare_without_signs(NODE* t) {
+    NODE *l = t->left, *r = t->right;
+    if (!is_negation(l, l->type) || commute_inv[t->op] == ILLOP) return false;
+    if (is_negation(r, l->type)) {
+        t->right = take_left(r);
+    } else {
+        if (r->op != FCON || f_is_nan(r->u.fval)) return false;
+        NODE* c = fold_constants(maketree(UMINUS, copy_tree(r), nullptr, r->type, r->ls));
+        if (c->op != FCON) {
+            erase_tree(c);
+            return false;
+        }
+        erase_tree(r);
+        t->right = c;
+    }
+    t->left = take_left(l);
+    t->op = commute_inv[t->op];
+    return true;
+}
+
+// The compare of integers that an ordered compare of two converted ones is, or ILLOP. Neither is a NaN.
+int integer_relop(int op, const TYPE* type) {
+    const int outcomes = float_op_to_micro_ops[op - FEQ] & 7; // equal, less, greater
+    const bool is_unsigned = type->is_unsigned();
+    switch (outcomes) {
+    case 1: return EQ;
+    case 6: return NEQ;
+    case 2: return is_unsigned ? ULT : LT;
+    case 3: return is_unsigned ? ULE : LE;
+    case 4: return is_unsigned ? UGT : GT;
+    case 5: return is_unsigned ? UGE : GE;
+    default: return ILLOP;
+    }
+}
+
+bool is_exact_conversion(const NODE* t) {
+    return t->op == SCONV && t->type->is_float() && holds_exactly(t->type, t->left->type) &&
+           t->left->type->size >= tp->int_t->size && !is_bitfield_access(t->left);
+}
+
+// (float)x rel (float)y and (float)x rel c of integers that the format has, with a c that is such an integer.
+NODE* compare_as_integers(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (!is_exact_conversion(l)) return nullptr;
+    TYPE* type = l->left->type->stqs();
+    const int op = integer_relop(t->op, type);
+    if (op == ILLOP) return nullptr;
+    if (is_exact_conversion(r) && same_integers(r->left->type, type) && r->type->size == l->type->size) {
+        t->right = take_left(r);
+    } else {
+        if (r->op != FCON) return nullptr;
+        NODE* c = fold_constants(maketree(SCONV, copy_tree(r), nullptr, type, r->ls));
+        NODE* back = fold_constants(maketree(SCONV, copy_tree(c), nullptr, r->type, r->ls));
+        const bool is_integer_constant = c->op == ICON && back->op == FCON && f_eq(back->u.fval, r->u.fval);
+        erase_tree(back);
+        if (!is_integer_constant) {
+            erase_tree(c);
+            return nullptr;
+        }
+        erase_tree(r);
+        t->right = c;
+    }
+    t->left = take_left(l);
+    t->op = op;
+    return simp_node(t, loop);
+}
+
+} // namespace
+
 // (double)x rel (double)y and (double)x rel c of an x that is float, with a c that is one.
 NODE* simp_float_relop(NODE* t, struct LOOP* loop) {
+    if (compare_without_signs(t)) return simp_node(t, loop);
+    if (NODE* r = compare_as_integers(t, loop)) return r;
     NODE *l = t->left, *r = t->right;
     auto widens = [](const NODE* n) {
         return n->op == SCONV && n->type->is_float() && n->left->type->is_float() &&

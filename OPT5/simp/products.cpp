@@ -64,6 +64,26 @@ NODE* multiply_negation(NODE* t, struct LOOP* loop) {
     return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
 }
 
+// |x| * |x| is x * x.
+NODE* multiply_absolutes(NODE* t, struct LOOP* loop) {
+    if (!is_unary(t->left, ABS) || !is_unary(t->right, ABS) || !same_value(t->left, t->right)) return nullptr;
+    t->left = take_left(t->left);
+    t->right = take_left(t->right);
+    return simp_node(t, loop);
+}
+
+// (x >> n) * 2^n clears the low bits.
+NODE* multiply_shifted_back(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    const int n = log2_of(t->right);
+    if (n <= 0 || inner->op != SRL || shift_count_of(inner) != n) return nullptr;
+    erase_node(inner->right);
+    t->left = take_left(inner);
+    t->op = ANDB;
+    set_icon(t->right, -t->right->u.lval);
+    return simp_node(t, loop);
+}
+
 // x * c1 * c2, (x << n) * c, and the constant of either operand moved outward.
 NODE* join_factors(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
@@ -147,7 +167,8 @@ NODE* multiply_under_cast(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
-const RULE product_rules[] = {multiply_by_small_constant, multiply_negation,     join_factors,       distribute,
+const RULE product_rules[] = {multiply_by_small_constant, multiply_negation,     multiply_absolutes,
+                              multiply_shifted_back,      join_factors,          distribute,
                               undo_exact_division,        multiply_truth_values, multiply_under_cast};
 
 // ---- Powers: x ** n times x ** m

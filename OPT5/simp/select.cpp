@@ -134,6 +134,96 @@ NODE* logical_arms(NODE* t, struct LOOP* loop) {
     return coerce_to_type(type, made(one ? OROR : ANDAND, condition, value, tp->int_t, loop));
 }
 
+// ---- Arms that a bit of the condition selects
+// x & p with the single bit p, as the control form has the test of it.
+bool tests_single_bit(const NODE* c) {
+    return is_node_with_icon(c, ANDB) && power_of_2(INT65(0, bits_of(c->right))) >= 0 && is_pure(c->left);
+}
+
+// x & p ? q : 0 of two single bits is x & p moved to the place of q.
+NODE* moved_bit(NODE* t, struct LOOP* loop) {
+    NODE *c = t->left, *a = then_arm(t), *b = else_arm(t);
+    if (!tests_single_bit(c) || !is_icon(a) || !is_icon(b, INT65(0)) || !same_integers(c->type, t->type))
+        return nullptr;
+    const int from = power_of_2(INT65(0, bits_of(c->right))), to = power_of_2(INT65(0, bits_of(a)));
+    if (to == 0 && from != 0) return nullptr; // a truth value is a compare
+    if (to < 0 || (from > to && is_signed(t->type) && bits_of(c->right) == sign_bit(t->type))) return nullptr;
+    TYPE* type = t->type->stqs();
+    erase_tree(t->right);
+    NODE* bit = coerced(type, take_left(t), loop);
+    if (from == to) return bit;
+    return made(from < to ? SLL : SRL, bit, mk_ICON(INT65(from < to ? to - from : from - to), tp->int_t), type, loop);
+}
+
+enum BIT_CHANGE { NONE, CLEARED, KEPT, SET };
+
+// What an arm does to the bit p of x, which is known there.
+BIT_CHANGE bit_change(const NODE* arm, const NODE* x, uint64_t p, bool is_set) {
+    if (same_value(arm, x)) return KEPT;
+    if (!arm->right || !is_node_with_icon(arm, arm->op) || !same_value(arm->left, x)) return NONE;
+    const uint64_t c = bits_of(arm->right), mask = mask_of(arm->type), minus_p = -p & mask;
+    switch (arm->op) {
+    case ANDB: return c == (~p & mask) ? CLEARED : NONE;
+    case ORB: return c == p ? SET : NONE;
+    case XORB: return c != p ? NONE : is_set ? CLEARED : SET;
+    case PLUS: return is_set && c == minus_p ? CLEARED : !is_set && c == p ? SET : NONE;
+    case MINUS: return is_set && c == p ? CLEARED : !is_set && c == minus_p ? SET : NONE;
+    default: return NONE;
+    }
+}
+
+// x & p ? x - p : x is x & ~p; x & p ? x : x + p is x | p; x & p ? x - p : x + p is x ^ p.
+NODE* changed_bit(NODE* t, struct LOOP* loop) {
+    NODE* c = t->left;
+    if (!tests_single_bit(c) || !same_integers(c->type, t->type)) return nullptr;
+    const uint64_t p = bits_of(c->right);
+    const BIT_CHANGE of_set = bit_change(then_arm(t), c->left, p, true),
+                     of_clear = bit_change(else_arm(t), c->left, p, false);
+    if (of_set == NONE || of_clear == NONE) return nullptr;
+    const bool stays_set = of_set != CLEARED, becomes_set = of_clear == SET;
+    NODE* x = copy_tree(c->left);
+    TYPE* type = t->type->stqs();
+    erase_tree(t);
+    if (stays_set && !becomes_set) return x;
+    const int op = stays_set ? ORB : becomes_set ? XORB : ANDB;
+    NODE* mask = mk_ICON(INT65(0), type);
+    set_icon(mask, INT65(0, op == ANDB ? ~p : p));
+    return made(op, x, mask, type, loop);
+}
+
+// x < 0 ? -1 : 0 is x >> (width - 1), x < 0 ? -1 : 1 is that | 1.
+NODE* arms_by_sign(NODE* t, struct LOOP* loop) {
+    NODE *c = t->left, *a = then_arm(t), *b = else_arm(t);
+    if ((c->op != LT && c->op != GE) || !is_icon(c->right, INT65(0)) || !is_integer(c->left->type) ||
+        !is_signed(c->left->type) || !same_integers(c->left->type, c->right->type) || !is_icon(a) || !is_icon(b) ||
+        !is_integer(t->type) || t->type->size < tp->int_t->size)
+        return nullptr;
+    if (c->op == GE) std::swap(a, b);
+    if (!is_all_ones(a) || (!is_icon(b, INT65(0)) && !is_icon(b, INT65(1)))) return nullptr;
+    if (!same_integers(a->type, t->type) || !same_integers(b->type, t->type)) return nullptr;
+    const bool sets_lowest = is_icon(b, INT65(1));
+    TYPE *type = t->type->stqs(), *from = c->left->type->stqs();
+    erase_tree(t->right);
+    erase_node(c->right);
+    NODE* x = take_left(take_left(t));
+    NODE* sign = made(SRL, x, mk_ICON(INT65(static_cast<long>(from->size) - 1), tp->int_t), from, loop);
+    sign = coerced(type, sign, loop);
+    return sets_lowest ? made(ORB, sign, mk_ICON(INT65(1), type), type, loop) : sign;
+}
+
+// x ? x * y : 0 is x * y, which is zero for that x, where y may be computed in any case.
+NODE* product_without_guard(NODE* t, struct LOOP*) {
+    NODE *c = t->left, *value = then_arm(t);
+    if (!is_icon(else_arm(t), INT65(0)) || (!is_node(value, MULT) && !is_node(value, ANDB)) || !is_pure(value))
+        return nullptr;
+    if (!same_integers(c->type, value->type) || !same_integers(value->type, t->type)) return nullptr;
+    const bool on_left = same_value(value->left, c);
+    if (!on_left && !same_value(value->right, c)) return nullptr;
+    const NODE* other = on_left ? value->right : value->left;
+    while (other->op == SCONV) other = other->left;
+    return other->op == NAME || other->op == ICON ? select_arm(t, true) : nullptr;
+}
+
 // ---- Arms of the same shape
 NODE* common_cast_outward(NODE* t, struct LOOP* loop) {
     NODE *a = then_arm(t), *b = else_arm(t);
@@ -160,13 +250,16 @@ NODE* absolute_value(NODE* t, struct LOOP* loop) {
                           (c->op == GT && (bound.is_zero() || bound == INT65(-1)));
     if (!negative && !positive) return nullptr;
     NODE *if_negative = negative ? then_arm(t) : else_arm(t), *otherwise = negative ? else_arm(t) : then_arm(t);
-    if (!is_unary(if_negative, UMINUS) || !same_value(if_negative->left, otherwise) ||
-        !same_value(c->left, otherwise) || !same_integers(otherwise->type, t->type))
+    const bool negates = is_unary(if_negative, UMINUS); // else the result is the absolute value's negative
+    NODE *negation = negates ? if_negative : otherwise, *same = negates ? otherwise : if_negative;
+    if (!is_unary(negation, UMINUS) || !same_value(negation->left, same) || !same_value(c->left, same) ||
+        !same_integers(same->type, t->type))
         return nullptr;
-    NODE* x = copy_tree(otherwise);
+    NODE* x = copy_tree(same);
     TYPE* type = t->type;
     erase_tree(t);
-    return made(ABS, x, nullptr, type, loop);
+    x = made(ABS, x, nullptr, type, loop);
+    return negates ? x : made(UMINUS, x, nullptr, type, loop);
 }
 
 // The test of a minimum or maximum: a < b ? a : b, a > b ? a : b, whatever it was.
@@ -190,12 +283,57 @@ NODE* ordered_arms(NODE* t, struct LOOP* loop) {
     return crossed || keeps_equals ? simp_node(t, loop) : nullptr;
 }
 
-const RULE select_rules[] = {
-    constant_condition, equal_arms,         condition_without_opposite, arm_by_equality, arm_by_truth,
-    constant_arms,      logical_arms,       condition_asked_again,      absolute_value,  minmax_of_QUEST,
-    ordered_arms,       common_cast_outward};
+const RULE select_rules[] = {constant_condition,
+                             equal_arms,
+                             arms_by_sign,
+                             moved_bit,
+                             changed_bit,
+                             product_without_guard,
+                             condition_without_opposite,
+                             arm_by_equality,
+                             arm_by_truth,
+                             constant_arms,
+                             logical_arms,
+                             condition_asked_again,
+                             absolute_value,
+                             minmax_of_QUEST,
+                             ordered_arms,
+                             common_cast_outward};
+
+// The arm under the operator of `t`, whose other operand, if there is one, is a constant; null where that is no
+// constant.
+NODE* folded_arm(const NODE* t, bool arms_on_left, const NODE* arm) {
+    const NODE* c = arms_on_left ? t->right : t->left;
+    NODE *x = copy_tree(arm), *y = c ? copy_tree(c) : nullptr;
+    NODE* r = fold_constants(maketree(t->op, arms_on_left ? x : y, arms_on_left ? y : x, t->type, t->ls));
+    if (r->op == ICON) return r;
+    erase_tree(r);
+    return nullptr;
+}
 
 } // namespace
+
+NODE* apply_to_constant_arms(NODE* t, struct LOOP* loop) {
+    auto has_constant_arms = [](const NODE* n) {
+        return n->op == QUEST && n->right->op == COLON && is_icon(n->right->left) && is_icon(n->right->right) &&
+               same_integers(n->right->left->type, n->type) && same_integers(n->right->right->type, n->type);
+    };
+    if (!is_integer(t->type) || t->type->size < tp->int_t->size) return t;
+    const bool on_left = has_constant_arms(t->left) && (!t->right || is_icon(t->right));
+    if (!on_left && !(t->right && is_icon(t->left) && has_constant_arms(t->right))) return t;
+    NODE* quest = on_left ? t->left : t->right;
+    NODE *a = folded_arm(t, on_left, then_arm(quest)), *b = a ? folded_arm(t, on_left, else_arm(quest)) : nullptr;
+    if (!b) {
+        erase_tree(a);
+        return t;
+    }
+    erase_tree(quest->right);
+    quest->right = maketree(COLON, a, b, t->type, quest->ls);
+    quest->type = t->type->stqs();
+    erase_tree(on_left ? t->right : t->left);
+    erase_node(t);
+    return simp_node(quest, loop);
+}
 
 NODE* simp_QUEST(NODE* t, struct LOOP* loop) {
     if (t->right->op != COLON) return t;

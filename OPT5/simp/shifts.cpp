@@ -44,7 +44,8 @@ TYPE* signed_type_of(uint64_t bits) {
 NODE* shift_there_and_back(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     const int n = shift_count_of(t);
-    if (!n || inner->op == t->op || shift_count_of(inner) != n) return nullptr;
+    const bool multiplies = t->op == SRL && is_node_with_icon(inner, MULT) && log2_of(inner->right) == n;
+    if (!n || (!multiplies && (inner->op == t->op || shift_count_of(inner) != n))) return nullptr;
     TYPE* type = t->type->stqs();
     const uint64_t mask = mask_of(type);
     uint64_t kept = (mask >> n) << n & mask;

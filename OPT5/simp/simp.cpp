@@ -203,7 +203,28 @@ bool is_sum_of_floats(const NODE* t) {
     return t->type->is_float() && t->left->type->is_float() && t->right->type->is_float();
 }
 
+bool is_number_operator(int op) {
+    switch (op) {
+    case PLUS:
+    case MINUS:
+    case MULT:
+    case ANDB:
+    case ORB:
+    case XORB:
+    case SLL:
+    case SRL:
+    case UMINUS:
+    case NOTB: return true;
+    default: return false;
+    }
+}
+
 NODE* dispatch(NODE* t, struct LOOP* loop) {
+    if (is_number_operator(t->op)) {
+        const int op = t->op;
+        t = apply_to_constant_arms(t, loop);
+        if (t->op != op) return t;
+    }
     switch (t->op) {
     case PLUS:
     case MINUS:

@@ -259,9 +259,19 @@ NODE* remainder(NODE* t, struct LOOP* loop) {
     return keep_term(t, r, true, false, loop);
 }
 
-const RULE sum_rules[] = {drop_zero,        canonical_constant,  join_constants,   constant_minus_sum,
-                          remove_negations, cancel_terms,        constant_outward, join_equal_terms,
-                          factor_out,       sum_with_complement, sum_of_bits,      remainder};
+// (x & c1) + (x & c2) of masks without a common bit is x & (c1 | c2).
+NODE* sum_of_masked(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (t->op != PLUS || !is_node_with_icon(l, ANDB) || !is_node_with_icon(r, ANDB) || !is_pure(l->left) ||
+        (bits_of(l->right) & bits_of(r->right)) != 0 || !same_value(l->left, r->left))
+        return nullptr;
+    set_icon(l->right, l->right->u.lval | r->right->u.lval);
+    return simp_node(only_left(t), loop);
+}
+
+const RULE sum_rules[] = {drop_zero,    canonical_constant, join_constants,   constant_minus_sum, remove_negations,
+                          cancel_terms, constant_outward,   join_equal_terms, factor_out,         sum_with_complement,
+                          sum_of_bits,  sum_of_masked,      remainder};
 
 NODE* simp_integer_sum(NODE* t, struct LOOP* loop) {
     if (!operands_have_type(t)) return t;

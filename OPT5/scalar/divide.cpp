@@ -9,8 +9,8 @@
 //
 // One of the two roundings always finds a factor whose products fit in twice the width of x, and one product of that
 // width is what the target multiplies in one instruction. What is known of the bounds of x may allow a narrower
-// product; dividends of the widest type are only multiplied where it does. Signed division by a power of two is a shift
-// of a biased dividend at every width.
+// product. For dividends of the widest type without such bounds the upper half of the product is put together from four
+// products of halves. Signed division by a power of two is a shift of a biased dividend at every width.
 //
 // Runs late: the passes before know more of a division than of what it becomes.
 #include "OPT5/scalar/divide.h"
@@ -35,19 +35,27 @@ using U128 = unsigned __int128;
 
 constexpr unsigned WIDEST = 64;
 
-bool rounded_up(uint64_t divisor, uint64_t limit, uint64_t product_limit, int shift, RECIPROCAL* r) {
+bool rounded_up(uint64_t divisor, uint64_t limit, uint64_t factor_limit, int shift, RECIPROCAL* r) {
     const U128 scale = U128(1) << shift, factor = scale / divisor + 1, error = factor * divisor - scale;
-    if (U128(limit) * error >= scale || factor > product_limit / limit) return false;
+    if (factor > factor_limit || U128(limit) * error >= scale) return false;
     *r = {static_cast<uint64_t>(factor), shift, false};
     return true;
 }
 
-bool rounded_down(uint64_t divisor, uint64_t limit, uint64_t product_limit, int shift, RECIPROCAL* r) {
+bool rounded_down(uint64_t divisor, uint64_t limit, uint64_t factor_limit, int shift, RECIPROCAL* r) {
     const U128 scale = U128(1) << shift, factor = scale / divisor, error = scale - factor * divisor;
-    if (factor == 0 || error == 0 || (U128(limit) + 1) * error > scale) return false;
-    if ((U128(limit) + 1) * factor > product_limit) return false;
+    if (factor == 0 || factor > factor_limit || error == 0 || (U128(limit) + 1) * error > scale) return false;
     *r = {static_cast<uint64_t>(factor), shift, true};
     return true;
+}
+
+// The product is that of all 64 bits of both; a shift takes at least its lower half.
+bool find_wide_reciprocal(uint64_t divisor, uint64_t limit, bool may_add, RECIPROCAL* r) {
+    for (int shift = 64; shift < 128; ++shift)
+        if (rounded_up(divisor, limit, UINT64_MAX, shift, r)) return true;
+    for (int shift = 64; may_add && shift < 128; ++shift)
+        if (rounded_down(divisor, limit, UINT64_MAX, shift, r)) return true;
+    return false;
 }
 
 // ---- Trees
@@ -64,8 +72,29 @@ std::vector<TYPE*> product_types(const TYPE* type, bool is_signed) {
     return types;
 }
 
+// Assignments ahead of a sequence, for values that it uses twice. A trial makes no variables: a leaf stands for each.
+struct SAVED_VALUES {
+    bool is_trial;
+    LS* scope;
+    std::vector<NODE*> values; // a trial owns them
+    NODE* assignments = nullptr;
+
+    NODE* save(NODE* value) {
+        TYPE* type = value->type;
+        if (is_trial) {
+            values.push_back(value);
+            return mk_ICON(INT65(0), type);
+        }
+        NODE* name = mk_NAME(sym_temp('N', -1, type, scope), scope);
+        NODE* asg = mk_ASG(name, value);
+        assignments = assignments ? mk_COMMAOP(assignments, asg) : asg;
+        return copy_tree(name);
+    }
+};
+
 // A dividend, a divisor of at least 2 and what is known of them.
 struct DIVISION {
+    SAVED_VALUES* saved;
     const NODE* x;
     TYPE* type;
     uint64_t divisor;
@@ -105,6 +134,39 @@ NODE* quotient_by_reciprocal(const DIVISION& d) {
     return nullptr;
 }
 
+// The upper half of x * factor, or of (x + 1) * factor, as numbers without sign. With halves xh, xl, fh and fl of 32
+// bits no sum below passes 64 bits, even with fl or fh added: (2^32 - 1)^2 + 2 * (2^32 - 1) is 2^64 - 1.
+NODE* upper_half_of_product(const DIVISION& d, const RECIPROCAL& r) {
+    TYPE* type = tp->ullong_t;
+    auto constant = [type](uint64_t c) { return mk_ICON(INT65(c), type); };
+    const uint64_t fh = r.factor >> 32, fl = r.factor & UINT32_MAX;
+    auto low = [type](NODE* t) { return coerce_to_type(type, coerce_to_type(tp->ulong_t, t)); };
+    auto high = [type](NODE* t) { return shifted(t, 32, type); };
+    auto x = [&] { return coerce_to_type(type, d.dividend()); };
+    auto plus = [type](NODE* a, NODE* b) { return binary(PLUS, a, b, type); };
+    auto times = [&](NODE* a, uint64_t c) { return binary(MULT, a, constant(c), type); };
+
+    NODE* lowest = times(low(x()), fl);
+    if (r.adds_factor) lowest = plus(lowest, constant(fl));
+    NODE* middle = d.saved->save(plus(times(high(x()), fl), high(lowest)));
+    NODE* other = plus(times(low(x()), fh), low(copy_tree(middle)));
+    if (r.adds_factor) other = plus(other, constant(fh));
+    return plus(plus(times(high(x()), fh), high(middle)), high(other));
+}
+
+// Seen as a number without sign a negative dividend is 2^64 too large, and the upper half too large by the factor.
+NODE* wide_quotient(const DIVISION& d) {
+    const bool is_signed = d.may_be_negative();
+    RECIPROCAL r;
+    if (!find_wide_reciprocal(d.divisor, d.greatest_magnitude(), !is_signed, &r)) return nullptr;
+    NODE* value = upper_half_of_product(d, r);
+    if (!is_signed) return coerce_to_type(d.type, shifted(value, r.shift - 64, tp->ullong_t));
+    TYPE* wide = tp->ullong_t;
+    NODE* excess = binary(ANDB, coerce_to_type(wide, d.sign_mask()), mk_ICON(INT65(r.factor), wide), wide);
+    value = coerce_to_type(d.type, binary(MINUS, value, excess, wide));
+    return binary(MINUS, shifted(value, r.shift - 64, d.type), d.sign_mask(), d.type);
+}
+
 bool is_least_value(INT65 c, TYPE* type) { return type->is_signed() && c == int_type_min(type); }
 
 // x / d.divisor, or x % d.divisor for `op` MOD; null if there is no sequence.
@@ -117,6 +179,7 @@ NODE* sequence_for_magnitude(int op, const DIVISION& d) {
         multiple = binary(ANDB, biased_dividend(d, n), mk_ICON(-INT65(d.divisor), type), type);
     } else {
         NODE* q = quotient_by_reciprocal(d);
+        if (!q && type->size == WIDEST) q = wide_quotient(d);
         if (!q || op == DIV) return q;
         multiple = binary(MULT, q, mk_ICON(INT65(d.divisor), type), type);
     }
@@ -124,7 +187,7 @@ NODE* sequence_for_magnitude(int op, const DIVISION& d) {
 }
 
 // What x / c or x % c becomes, with `x` copied into it as often as it takes, or null.
-NODE* sequence_for(int op, const NODE* x, INT65 c, TYPE* type, INT65 low, INT65 high) {
+NODE* sequence_for(int op, const NODE* x, INT65 c, TYPE* type, INT65 low, INT65 high, SAVED_VALUES& saved) {
     if (is_least_value(c, type)) { // the type does not hold its magnitude
         NODE* q = coerce_to_type(type, maketree(EQ, copy_tree(x), mk_ICON(c, type), tp->int_t, x->ls));
         if (op == DIV) return q;
@@ -133,7 +196,7 @@ NODE* sequence_for(int op, const NODE* x, INT65 c, TYPE* type, INT65 low, INT65 
     // The remainder has the dividend's sign, whatever the divisor's.
     const INT65 magnitude = c.is_negative() ? -c : c;
     if (magnitude <= INT65(1)) return nullptr;
-    NODE* r = sequence_for_magnitude(op, {x, type, magnitude.value, low, high});
+    NODE* r = sequence_for_magnitude(op, {&saved, x, type, magnitude.value, low, high});
     return r && op == DIV && c.is_negative() ? maketree(UMINUS, r, nullptr, type, x->ls) : r;
 }
 
@@ -149,6 +212,21 @@ TYPE* type_of_division(const NODE* t) {
     if (!t->type->is_int() || !(t->type->is_signed() || t->type->is_unsigned()) || t->type->is_bool()) return nullptr;
     const bool same = compatible_types(t->left->type, t->type, true) && compatible_types(t->right->type, t->type, true);
     return same && t->type->size >= tp->int_t->size && t->type->size <= WIDEST ? t->type->stqs() : nullptr;
+}
+
+// What a sequence for a dividend that costs nothing costs; -1 if there is none.
+long cost_of_sequence(int op, INT65 c, TYPE* type, INT65 low, INT65 high) {
+    SAVED_VALUES saved{true, nullptr, {}};
+    NODE* leaf = mk_ICON(INT65(0), type);
+    NODE* sequence = sequence_for(op, leaf, c, type, low, high, saved);
+    long cost = sequence ? cost_for_DIV_to_MULT_expr(sequence) : -1;
+    for (NODE* value : saved.values) {
+        if (sequence) cost += cost_for_DIV_to_MULT_expr(value);
+        erase_tree(value);
+    }
+    if (sequence) erase_tree(sequence);
+    erase_tree(leaf);
+    return cost;
 }
 
 // A modulus costs at least the division that it contains.
@@ -206,13 +284,16 @@ NODE* without_divisions(NODE* t, bool* changed) {
 
 bool find_reciprocal(uint64_t divisor, uint64_t limit, uint64_t product_limit, int free_shift, bool may_add,
                      RECIPROCAL* result) {
-    if (rounded_up(divisor, limit, product_limit, free_shift, result)) return true;
+    const uint64_t up = product_limit / limit;
+    if (rounded_up(divisor, limit, up, free_shift, result)) return true;
     int bits = 0;
     while (bits < 64 && product_limit >> bits) ++bits;
     for (int shift = 1; shift < bits; ++shift)
-        if (rounded_up(divisor, limit, product_limit, shift, result)) return true;
-    for (int shift = 1; may_add && shift < bits; ++shift)
-        if (rounded_down(divisor, limit, product_limit, shift, result)) return true;
+        if (rounded_up(divisor, limit, up, shift, result)) return true;
+    if (!may_add || limit == UINT64_MAX) return false;
+    const uint64_t down = product_limit / (limit + 1);
+    for (int shift = 1; shift < bits; ++shift)
+        if (rounded_down(divisor, limit, down, shift, result)) return true;
     return false;
 }
 
@@ -221,23 +302,15 @@ NODE* warp_DIV_to_MULT(NODE* t) {
     INT65 low, high;
     if (!type || !calculate_bounds(t->left, nullptr, &low, &high) || (low.is_zero() && high.is_zero())) return t;
     const INT65 c = t->right->u.lval;
-    NODE* leaf = mk_ICON(INT65(0), type);
-    NODE* trial = sequence_for(t->op, leaf, c, type, low, high);
-    erase_tree(leaf);
-    if (!trial) return t;
-    const long cost = cost_for_DIV_to_MULT_expr(trial) + cost_for_DIV_to_MULT_expr(t->left);
-    erase_tree(trial);
-    if (cost >= cost_of_division(t)) return t;
+    const long cost = cost_of_sequence(t->op, c, type, low, high);
+    if (cost < 0 || cost + cost_for_DIV_to_MULT_expr(t->left) >= cost_of_division(t)) return t;
 
-    NODE* sequence;
-    const bool occurs_once = t->op == DIV && (!low.is_negative() || is_least_value(c, type));
-    if (occurs_once || is_repeatable(t->left))
-        sequence = sequence_for(t->op, t->left, c, type, low, high);
-    else {
-        NODE* x = mk_NAME(sym_temp('N', -1, type, t->ls), t->ls);
-        sequence = sequence_for(t->op, x, c, type, low, high);
-        sequence = mk_COMMAOP(mk_ASG(x, copy_tree(t->left)), sequence);
-    }
+    SAVED_VALUES saved{false, t->ls, {}};
+    const bool occurs_once = t->op == DIV && type->size < WIDEST && (!low.is_negative() || is_least_value(c, type));
+    NODE* x = occurs_once || is_repeatable(t->left) ? copy_tree(t->left) : saved.save(copy_tree(t->left));
+    NODE* sequence = sequence_for(t->op, x, c, type, low, high, saved);
+    erase_tree(x);
+    sequence = mk_COMMAOP(saved.assignments, sequence);
     if (print_debug) {
         debug_printf("Replacing this DIV by an ICON: %s\n", tree_to_infix(t).c_str());
         debug_printf("   with this \"magic\" sequence: %s\n", tree_to_infix(sequence).c_str());

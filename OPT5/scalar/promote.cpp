@@ -263,6 +263,14 @@ bool block_has_embedded(const BBLK* bb) {
     return false;
 }
 
+// The statement `a, b` becomes two.
+void open_comma(LIST* s) {
+    NODE* comma = s->first;
+    s->rest = mkelist(comma->right, s->rest, s->psn);
+    s->first = comma->left;
+    erase_node(comma);
+}
+
 } // namespace
 
 bool promote_embedded_assignments_in_bb(BBLK* bb) {
@@ -273,6 +281,11 @@ bool promote_embedded_assignments_in_bb(BBLK* bb) {
         const bool may_be_left = s->rest && tree_is_EH_SWITCH(s->rest->first);
         if (may_be_left || is_left_alone(s->first) || !has_embedded(s->first)) {
             link = &s->rest;
+            continue;
+        }
+        if (s->first->op == COMMAOP) {
+            open_comma(s);
+            changed = true;
             continue;
         }
         PROMOTER promoter(s->first);

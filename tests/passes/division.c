@@ -31,10 +31,21 @@ int never_negative(int x) { return (x & 1023) / 10; }
 // HAS: return (x >> 63 & 7) + x >> 3
 long long widest(long long x) { return x / 8; }
 
-// No product is wide enough.
+// Four products of halves.
 // FUNCTION: widest_by_seven
-// HAS: return x / 7
+// COUNT 0: / 7
 long long widest_by_seven(long long x) { return x / 7; }
+
+// FUNCTION: digits
+// COUNT 2: x >> 32) * 3435973836
+// NOT: / 10
+// NOT: % 10
+// COUNT 0: /^(sum|x)$/
+int digits(unsigned long long x) {
+    int sum = 0;
+    for (; x; x /= 10) sum += (int)(x % 10);
+    return sum;
+}
 
 // FUNCTION: from_memory
 // HAS: $O$N0 = *(&_a + i)
@@ -89,6 +100,8 @@ int main(void) {
     }
     put_i16(read_once());
     volatile_in_place();
+    put_i16(digits(18446744073709551615ULL));
+    put_i16(digits(12345678901234567890ULL));
     put_i16(v);
     put_u32(g);
     return 0;

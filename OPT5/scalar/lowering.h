@@ -7,6 +7,7 @@ class NODE;
 void remove_tail_recursion();
 // Whether a statement saves the environment, to which control may come back later.
 bool calls_setjmp(const NODE* tree);
+bool function_saves_environment(); // the current function, in a statement
 
 // Bit-field accesses become operations on their containers.
 void expand_bitfields();

@@ -531,13 +531,6 @@ void MERGE::run() {
     remove_counter(*mapped->counter);
 }
 
-bool saves_environment() {
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            if (calls_setjmp(s->first)) return true;
-    return false;
-}
-
 } // namespace
 
 void init_skewed_offset_syms() { skewed_offset_syms.clear(); }
@@ -550,7 +543,7 @@ void merge_symbols() {
         debug_printf("Merging symbols for %s\n", currfunc->name);
     }
     init_skewed_offset_syms();
-    if (saves_environment()) return;
+    if (function_saves_environment()) return;
     renumber_bblocks();
     NATURAL_LOOPS loops;
     if (loops.inner_first().empty()) return;

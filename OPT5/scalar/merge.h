@@ -7,6 +7,9 @@ class SYMTAB;
 void rename_symbols();
 void merge_symbols();
 
+// A variable of the current function that is like `sym`, the n-th of it; with what is known of a pointer.
+SYMTAB* clone_symbol(SYMTAB* sym, int n);
+
 // The pointers of the current function that a use of them has an offset to.
 void init_skewed_offset_syms();
 bool is_skewed_offset_sym(const SYMTAB* sym);

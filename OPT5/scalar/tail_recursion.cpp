@@ -357,4 +357,11 @@ bool calls_setjmp(const NODE* t) {
     });
 }
 
+bool function_saves_environment() {
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            if (calls_setjmp(s->first)) return true;
+    return false;
+}
+
 void remove_tail_recursion() { TAIL_RECURSION().run(); }

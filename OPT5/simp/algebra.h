@@ -8,6 +8,8 @@ struct LOOP;
 
 // ---- Arithmetic and bits
 NODE* simp_by_known_bits(NODE* t); // a constant where every bit of the value is known, or the tree
+// Puts in place of the tree at `link` one with the same bits where `mask` has ones; whether anything changed.
+bool narrow_to_mask(NODE** link, uint64_t mask);
 NODE* simp_PLUS(NODE* t, struct LOOP* loop);
 NODE* simp_MINUS(NODE* t, struct LOOP* loop);
 NODE* simp_MULT(NODE* t, struct LOOP* loop);

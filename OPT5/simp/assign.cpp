@@ -33,9 +33,11 @@ void convert_value(NODE* t, struct LOOP* loop) {
     NODE *lhs = t->left, *rhs = t->right;
     const bool differs = !compatible_types(lhs->type, rhs->type, true);
     if ((!differs && !bitfield_of(lhs)) || !is_integral(lhs->type) || !is_integral(rhs->type)) return;
+    const bool keeps_low_bits = is_integer(lhs->type) && is_integer(rhs->type) && rhs->type->size >= lhs->type->size &&
+                                !is_bitfield_access(rhs); // what the store does by itself
     if (is_constant(rhs, ICON))
         t->right = truncate_RHS_for_assignment(lhs, rhs);
-    else if (differs)
+    else if (differs && !keeps_low_bits)
         t->right = coerced(lhs->type->stqs(), rhs, loop);
 }
 
@@ -284,7 +286,7 @@ NODE* compound_with_value(NODE* t, struct LOOP* loop) {
     if ((op == PLUS || op == MINUS) && is_unary(e, UMINUS)) {
         t->op = op == PLUS ? MINUSASG : PLUSASG;
         t->right = take_left(e);
-        return t;
+        return simp_node(t, loop);
     }
     return nullptr;
 }
@@ -347,24 +349,6 @@ NODE* simp_MEMCPY(NODE* t, struct LOOP*) {
     return type->is_pointer() ? coerce_to_type(type, value) : value;
 }
 
-namespace {
-
-constexpr int MOST_COMMAS = 16;
-
-// (a, (b, c)), d with chains that lean left. Right-leaning chains are short where they come from the rules.
-NODE* lean_left(NODE* t, int levels) {
-    while (levels-- > 0 && t->right->op == COMMAOP) { // a, (b, c) is (a, b), c
-        NODE* inner = t->right;
-        t->right = inner->left;
-        t->type = t->right->type;
-        inner->left = lean_left(t, levels);
-        t = inner;
-    }
-    return t;
-}
-
-} // namespace
-
 // Operands before the last have their effects only, and those once.
 NODE* simp_COMMAOP(NODE* t, struct LOOP*) {
     if (t->left->op == COMMAOP) {
@@ -379,5 +363,5 @@ NODE* simp_COMMAOP(NODE* t, struct LOOP*) {
         if (!t->left) return take_right(t);
     }
     t->type = t->right->type;
-    return lean_left(t, MOST_COMMAS);
+    return lean_left(t);
 }

@@ -59,9 +59,7 @@ NODE* constant_against_known_bits(NODE* t, struct LOOP* loop) {
     const uint64_t mask = mask_of(t->type), c = bits_of(t->right);
     const KNOWN_BITS k = known_bits(t->left);
     if (t->op == ANDB ? ((k.zeros | c) & mask) == mask : (c & ~k.ones) == 0) return only_left(t);
-    NODE* former = t->left;
-    t->left = prop_mask_into_subtree(former, INT65(0, t->op == ANDB ? c : mask & ~c));
-    return t->left == former ? nullptr : simp_node(t, loop);
+    return narrow_to_mask(&t->left, t->op == ANDB ? c : mask & ~c) ? simp_node(t, loop) : nullptr;
 }
 
 // (x & c1) | c2 with no bit left for the mask to clear.

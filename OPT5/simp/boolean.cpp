@@ -71,7 +71,7 @@ NODE* without_idle_layers(NODE* t) {
 
 NODE* constant_truth(NODE* t, bool value) {
     NODE* effects = peel_for_effect(t);
-    return mk_COMMAOP(effects, mk_ICON(INT65(value ? 1 : 0), tp->int_t));
+    return in_sequence(effects, mk_ICON(INT65(value ? 1 : 0), tp->int_t));
 }
 
 bool all_bits_are_zero(const NODE* t) { return is_integral(t) && find_known_zeros(t, t->type) == type_mask(t->type); }
@@ -189,7 +189,7 @@ NODE* make_boolean(NODE* t, struct LOOP* loop) {
         return truth;
     }
     if (t->op == MIXVALUE && reinterpret_cast<uintptr_t>(t->u.rval) <= 1) return t;
-    if (returns_1_or_0(t)) return coerce_to_type(tp->int_t, t);
+    if (returns_1_or_0(t)) return coerced(tp->int_t, t, loop);
     return compare_with_zero(t, NEQ, FNEQN, loop);
 }
 

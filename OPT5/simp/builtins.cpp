@@ -81,7 +81,7 @@ NODE* eval_qc_ICALL(NODE* t) {
     const bool then = is_icon(test) && !test->u.lval.is_zero();
     if (!is_icon(test) || (then && !is_pure(b) && !is_steady_leaf(a))) return t;
     NODE* effects = peel_for_effect(copy_tree(then ? b : a));
-    return mk_COMMAOP(effects, replace_by(t, copy_tree(then ? a : b)));
+    return in_sequence(effects, replace_by(t, copy_tree(then ? a : b)));
 }
 
 // ---- Marks

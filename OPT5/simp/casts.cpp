@@ -42,8 +42,7 @@ NODE* integer_cast_of_cast(NODE* t, struct LOOP* loop) {
 NODE* narrow_under_cast(NODE* t, struct LOOP* loop) {
     NODE* operand = t->left;
     if (!is_integer(t->type) || !is_integer(operand->type) || t->type->size >= operand->type->size) return nullptr;
-    t->left = prop_mask_into_subtree(operand, type_mask(t->type));
-    return t->left == operand ? nullptr : simp_node(t, loop);
+    return narrow_to_mask(&t->left, mask_of(t->type)) ? simp_node(t, loop) : nullptr;
 }
 
 // An operator whose result is cut to a narrower type: computed there. One operand of an operator on bits may be any

@@ -13,8 +13,10 @@ constexpr int MOST_LEVELS = 6;
 
 class NARROWING {
 public:
+    bool changed = false; // anywhere in the tree, also where its root stayed
+
     // A tree that agrees with `t` in the bits of `mask`.
-    NODE* narrow(NODE* t, uint64_t mask, int levels) const {
+    NODE* narrow(NODE* t, uint64_t mask, int levels) {
         mask &= mask_of(t->type);
         if (!levels || !is_integer(t->type) || mask == mask_of(t->type) || is_icon(t)) return t;
         switch (t->op) {
@@ -27,7 +29,7 @@ public:
         case MULT: return operands_have_type(t) ? both(t, up_to_highest(mask), levels) : t;
         case ABS:
             if (mask != 1 || !operand_has_type(t)) return t; // the lowest bit is the same of either sign
-            return narrow(take_left(t), mask, levels - 1);
+            return dropped(take_left(t), mask, levels - 1);
         case UMINUS: return operand_has_type(t) ? left_only(t, up_to_highest(mask), levels) : t;
         case SLL:
         case SRL: return shift(t, mask, levels);
@@ -43,36 +45,41 @@ private:
         return mask;
     }
 
-    NODE* left_only(NODE* t, uint64_t mask, int levels) const {
-        NODE* former = t->left;
-        t->left = narrow(former, mask, levels - 1);
-        return t->left == former ? t : simp_node(t, nullptr);
+    NODE* dropped(NODE* operand, uint64_t mask, int levels) {
+        changed = true;
+        return narrow(operand, mask, levels);
     }
 
-    NODE* both(NODE* t, uint64_t mask, int levels) const {
-        NODE *l = t->left, *r = t->right;
-        t->left = narrow(l, mask, levels - 1);
-        t->right = narrow(r, mask, levels - 1);
-        return t->left == l && t->right == r ? t : simp_node(t, nullptr);
+    // The operands first, then the node if one of them changed.
+    NODE* operands(NODE* t, uint64_t mask, int levels, bool both) {
+        const bool before = changed;
+        changed = false;
+        t->left = narrow(t->left, mask, levels - 1);
+        if (both) t->right = narrow(t->right, mask, levels - 1);
+        const bool any = changed;
+        changed |= before;
+        return any ? simp_node(t, nullptr) : t;
     }
+    NODE* left_only(NODE* t, uint64_t mask, int levels) { return operands(t, mask, levels, false); }
+    NODE* both(NODE* t, uint64_t mask, int levels) { return operands(t, mask, levels, true); }
 
-    NODE* sum(NODE* t, uint64_t mask, int levels) const {
+    NODE* sum(NODE* t, uint64_t mask, int levels) {
         const bool idle = is_icon(t->right) && (bits_of(t->right) & mask) == 0;
-        return idle ? narrow(only_left(t), mask, levels - 1) : both(t, mask, levels);
+        return idle ? dropped(only_left(t), mask, levels - 1) : both(t, mask, levels);
     }
 
-    NODE* bit_operator(NODE* t, uint64_t mask, int levels) const {
+    NODE* bit_operator(NODE* t, uint64_t mask, int levels) {
         if (!is_icon(t->right)) return both(t, mask, levels);
         const uint64_t c = bits_of(t->right);
         const KNOWN_BITS k = known_bits(t->left);
         const bool idle = t->op == ANDB  ? (mask & ~(c | k.zeros)) == 0
                           : t->op == ORB ? (mask & c & ~k.ones) == 0
                                          : (mask & c) == 0;
-        if (idle) return narrow(only_left(t), mask, levels - 1);
+        if (idle) return dropped(only_left(t), mask, levels - 1);
         return left_only(t, t->op == ANDB ? mask & c : t->op == ORB ? mask & ~c : mask, levels);
     }
 
-    NODE* shift(NODE* t, uint64_t mask, int levels) const {
+    NODE* shift(NODE* t, uint64_t mask, int levels) {
         const int n = shift_count_of(t);
         if (!n) return t;
         if (t->op == SLL) return left_only(t, mask >> n, levels);
@@ -82,13 +89,14 @@ private:
     }
 
     // Between integers. A cast to or from `bool` looks at more than bits; a bit-field is read through its cast.
-    NODE* cast(NODE* t, uint64_t mask, int levels) const {
+    NODE* cast(NODE* t, uint64_t mask, int levels) {
         TYPE* from = t->left->type;
         if (!is_integer(from) || is_bitfield_access(t->left)) return t;
         NODE* inner = t->left;
         if (inner->op == SCONV && is_integer(inner->left->type) && !is_bitfield_access(inner->left) &&
             (mask & ~mask_of(from)) == 0) {
             TYPE* type = t->type;
+            changed = true;
             NODE* operand = take_left(take_left(t));
             return coerced(type, operand, nullptr);
         }
@@ -100,4 +108,13 @@ private:
 
 } // namespace
 
-NODE* prop_mask_into_subtree(NODE* t, INT65 mask) { return NARROWING().narrow(t, mask.value, MOST_LEVELS); }
+bool narrow_to_mask(NODE** link, uint64_t mask) {
+    NARROWING narrowing;
+    *link = narrowing.narrow(*link, mask, MOST_LEVELS);
+    return narrowing.changed;
+}
+
+NODE* prop_mask_into_subtree(NODE* t, INT65 mask) {
+    narrow_to_mask(&t, mask.value);
+    return t;
+}

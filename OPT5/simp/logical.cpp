@@ -309,8 +309,11 @@ NODE* simp_strict_operands(NODE* t, struct LOOP* loop) {
 // case, and what is passed over, which is then asked only if both say nothing, must have no effects.
 NODE* join_within_chain(NODE* t, struct LOOP* loop) {
     if (!test_of(t->right).value && !bits_test_of(t->right, false).value) return nullptr;
-    NODE* chain = t->left;
-    for (int i = 0; i < andor_andor_height && chain->op == t->op; ++i, chain = chain->left) {
+    NODE** nodes[andor_andor_height]; // of the chain, from the top
+    NODE** at = &t->left;
+    for (int i = 0; i < andor_andor_height && (*at)->op == t->op; ++i, at = &(*at)->left) {
+        NODE* chain = *at;
+        nodes[i] = at;
         NODE** links[] = {&chain->right, chain->left->op == t->op ? nullptr : &chain->left};
         for (NODE** link : links) {
             if (!link) continue;
@@ -322,7 +325,8 @@ NODE* join_within_chain(NODE* t, struct LOOP* loop) {
                 continue;
             }
             *link = joined;
-            return simp_node(take_left(t), loop);
+            for (int k = i; k >= 0; --k) *nodes[k] = simp_for_control(simp_node(*nodes[k], loop), loop);
+            return make_boolean(take_left(t), loop);
         }
         if (!is_pure(chain->right)) return nullptr;
     }
@@ -337,7 +341,7 @@ NODE* lean_left(NODE* t, struct LOOP* loop) {
     if (inner->left->op == t->op) return nullptr;
     NODE* chain = t->right;
     t->right = inner->left;
-    inner->left = simp_node(t, loop);
+    inner->left = simp_for_control(simp_node(t, loop), loop);
     return chain == inner ? simp_node(chain, loop) : chain;
 }
 

@@ -125,7 +125,7 @@ NODE* only_argument(NODE* t, bool first) {
     NODE* args = take_left(t);
     NODE *a = args->left, *b = args->right;
     erase_node(args);
-    if (!first) return mk_COMMAOP(peel_for_effect(a), b);
+    if (!first) return in_sequence(peel_for_effect(a), b);
     erase_tree(b);
     return a;
 }

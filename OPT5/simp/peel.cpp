@@ -1,5 +1,6 @@
 // What remains of a tree whose value isn't used: its side effects, in their order.
 
+#include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 
 namespace {
@@ -15,7 +16,7 @@ NODE* erase_and_keep(NODE* t, NODE* kept) {
 NODE* peel_operands(NODE* t) {
     NODE* left = t->left ? peel_for_effect(t->left) : nullptr;
     NODE* right = t->right ? peel_for_effect(t->right) : nullptr;
-    return erase_and_keep(t, !left ? right : right ? mk_COMMAOP(left, right) : left);
+    return erase_and_keep(t, rules::in_sequence(left, right));
 }
 
 // The object whose address is taken isn't read; a pointer that leads to it is.

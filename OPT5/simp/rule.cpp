@@ -60,9 +60,15 @@ NODE* made(int op, NODE* left, NODE* right, TYPE* type, struct LOOP* loop) {
 NODE* coerced(TYPE* type, NODE* t, struct LOOP* loop) {
     auto is_cast = [](const NODE* n) { return n->op == SCONV || n->op == PCONV; };
     NODE* r = coerce_to_type(type, t);
-    if (r->op == QUEST && r->right->op == COLON) // the cast may have gone into the arms
+    if (r->op == QUEST && r->right->op == COLON) { // the cast may have gone into the arms
+        bool any = false;
         for (NODE** arm : {&r->right->left, &r->right->right})
-            if (is_cast(*arm)) *arm = simp_node(*arm, loop);
+            if (is_cast(*arm)) {
+                *arm = simp_node(*arm, loop);
+                any = true;
+            }
+        return any ? simp_node(r, loop) : r;
+    }
     return is_cast(r) ? simp_node(r, loop) : r;
 }
 
@@ -78,6 +84,23 @@ void order_operands(NODE* t) {
     if (is_steady_leaf(t->left) || is_steady_leaf(t->right) || (is_pure(t->left) && is_pure(t->right)))
         std::swap(t->left, t->right);
 }
+
+constexpr int MOST_COMMAS = 16;
+
+static NODE* lean_left_within(NODE* t, int levels) {
+    while (levels-- > 0 && t->right->op == COMMAOP) { // a, (b, c) is (a, b), c
+        NODE* inner = t->right;
+        t->right = inner->left;
+        t->type = t->right->type;
+        inner->left = lean_left_within(t, levels);
+        t = inner;
+    }
+    return t;
+}
+
+NODE* lean_left(NODE* commaop) { return lean_left_within(commaop, MOST_COMMAS); }
+
+NODE* in_sequence(NODE* a, NODE* b) { return a && b ? lean_left(mk_COMMAOP(a, b)) : a ? a : b; }
 
 NODE* take_left(NODE* t) {
     NODE* operand = t->left;
@@ -108,8 +131,7 @@ NODE* constant_for(NODE* t, INT65 value) {
     NODE* left = t->left ? peel_for_effect(t->left) : nullptr;
     NODE* right = t->right ? peel_for_effect(t->right) : nullptr;
     erase_node(t);
-    NODE* effects = left && right ? simp_node(mk_COMMAOP(left, right), nullptr) : left ? left : right;
-    return mk_COMMAOP(effects, result);
+    return in_sequence(in_sequence(left, right), result);
 }
 
 NODE* to_unary(NODE* t, int op, NODE* operand) {

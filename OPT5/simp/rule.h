@@ -80,6 +80,11 @@ NODE* coerced(TYPE* type, NODE* t, struct LOOP* loop);
 // Operands of a commutative operator: constants to the right; a leaf right of what isn't one; EXPT to the left.
 void order_operands(NODE* t);
 
+// ---- Sequences
+// a, b with either null; chains lean left. Right-leaning chains are short where they come from the rules.
+NODE* in_sequence(NODE* a, NODE* b);
+NODE* lean_left(NODE* commaop); // the same of a chain that is there
+
 // ---- Replacement
 NODE* take_left(NODE* t);  // frees the node alone: its left operand
 NODE* take_right(NODE* t); // the same: its right operand

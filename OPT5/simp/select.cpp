@@ -19,19 +19,19 @@ NODE*& else_arm(NODE* quest) { return quest->right->right; }
 
 NODE* in_type(TYPE* type, NODE* value) { return type->is_scalar() ? coerce_to_type(type, value) : value; }
 
-NODE* select_arm(NODE* t, bool then) {
+NODE* select_arm(NODE* t, bool then, struct LOOP* loop) {
     NODE *kept = then ? then_arm(t) : else_arm(t), *dropped = then ? else_arm(t) : then_arm(t);
     TYPE* type = t->type;
     erase_tree(dropped);
     erase_node(t->right);
     erase_tree(t->left);
     erase_node(t);
-    return in_type(type, kept);
+    return type->is_scalar() ? coerced(type, kept, loop) : kept;
 }
 
-NODE* constant_condition(NODE* t, struct LOOP*) {
+NODE* constant_condition(NODE* t, struct LOOP* loop) {
     if (!is_icon(t->left)) return nullptr;
-    return select_arm(t, !t->left->u.lval.is_zero());
+    return select_arm(t, !t->left->u.lval.is_zero(), loop);
 }
 
 // (x == 0) ? a : b is x ? b : a.
@@ -54,27 +54,27 @@ NODE* equal_arms(NODE* t, struct LOOP*) {
     erase_tree(else_arm(t));
     erase_node(t->right);
     erase_node(t);
-    return mk_COMMAOP(effects, in_type(type, value));
+    return in_sequence(effects, in_type(type, value));
 }
 
 // x == c ? c : x, x != y ? x : y: the arm that is x in either case.
-NODE* arm_by_equality(NODE* t, struct LOOP*) {
+NODE* arm_by_equality(NODE* t, struct LOOP* loop) {
     NODE* c = t->left;
     if ((c->op != EQ && c->op != NEQ) || !c->left->type->is_int() || !is_pure(c)) return nullptr;
     NODE *same = c->op == EQ ? then_arm(t) : else_arm(t), *other = c->op == EQ ? else_arm(t) : then_arm(t);
     const bool holds = (same_value(c->left, other) && same_value(c->right, same)) ||
                        (same_value(c->right, other) && same_value(c->left, same));
-    return holds ? select_arm(t, other == then_arm(t)) : nullptr;
+    return holds ? select_arm(t, other == then_arm(t), loop) : nullptr;
 }
 
 // x ? x : 0 and the like, in control form: x ? 0 : x is 0.
-NODE* arm_by_truth(NODE* t, struct LOOP*) {
+NODE* arm_by_truth(NODE* t, struct LOOP* loop) {
     NODE* c = t->left;
     if (!is_integer(c->type) || !is_pure(c)) return nullptr;
     if (same_value(c, then_arm(t)) && is_icon(else_arm(t), INT65(0)) && same_integers(c->type, t->type))
-        return select_arm(t, true);
+        return select_arm(t, true, loop);
     if (same_value(c, else_arm(t)) && is_icon(then_arm(t), INT65(0)) && same_integers(c->type, t->type))
-        return select_arm(t, true);
+        return select_arm(t, true, loop);
     return nullptr;
 }
 
@@ -86,7 +86,7 @@ NODE* condition_asked_again(NODE* t, struct LOOP* loop) {
         if (arm->op != QUEST || arm->right->op != COLON) continue;
         const bool same = bools_are_congruent(t->left, arm->left, false, false);
         if (!same && !bools_are_congruent(t->left, arm->left, true, false)) continue;
-        arm = select_arm(arm, then == same);
+        arm = select_arm(arm, then == same, loop);
         return simp_node(t, loop);
     }
     return nullptr;
@@ -104,7 +104,7 @@ NODE* constant_arms(NODE* t, struct LOOP* loop) {
         erase_tree(t->right);
         NODE* condition = make_boolean(take_left(t), loop);
         if (inverse) condition = simp_node(invert_boolean_tree(condition), loop);
-        return coerce_to_type(type, condition);
+        return coerced(type, condition, loop);
     }
     if (!returns_1_or_0(t->left) || !same_integers(a->type, type) || !same_integers(b->type, type)) return nullptr;
     const bool scales = y.is_zero() && (is_all_ones(a) || power_of_2(x) > 0), adds = y + INT65(1) == x;
@@ -131,7 +131,7 @@ NODE* logical_arms(NODE* t, struct LOOP* loop) {
     erase_node(constant);
     erase_node(t->right);
     erase_node(t);
-    return coerce_to_type(type, made(one ? OROR : ANDAND, condition, value, tp->int_t, loop));
+    return coerced(type, made(one ? OROR : ANDAND, condition, value, tp->int_t, loop), loop);
 }
 
 // ---- Arms that a bit of the condition selects
@@ -212,7 +212,7 @@ NODE* arms_by_sign(NODE* t, struct LOOP* loop) {
 }
 
 // x ? x * y : 0 is x * y, which is zero for that x, where y may be computed in any case.
-NODE* product_without_guard(NODE* t, struct LOOP*) {
+NODE* product_without_guard(NODE* t, struct LOOP* loop) {
     NODE *c = t->left, *value = then_arm(t);
     if (!is_icon(else_arm(t), INT65(0)) || (!is_node(value, MULT) && !is_node(value, ANDB)) || !is_pure(value))
         return nullptr;
@@ -221,7 +221,7 @@ NODE* product_without_guard(NODE* t, struct LOOP*) {
     if (!on_left && !same_value(value->right, c)) return nullptr;
     const NODE* other = on_left ? value->right : value->left;
     while (other->op == SCONV) other = other->left;
-    return other->op == NAME || other->op == ICON ? select_arm(t, true) : nullptr;
+    return other->op == NAME || other->op == ICON ? select_arm(t, true, loop) : nullptr;
 }
 
 // ---- Arms of the same shape

@@ -98,10 +98,8 @@ NODE* shift_product(NODE* t, struct LOOP* loop) {
 NODE* narrow_operand(NODE* t, struct LOOP* loop) {
     const int n = shift_count_of(t);
     if (!n) return nullptr;
-    NODE* former = t->left;
     const uint64_t mask = mask_of(t->type);
-    t->left = prop_mask_into_subtree(former, INT65(0, t->op == SLL ? mask >> n : mask << n & mask));
-    return t->left == former ? nullptr : simp_node(t, loop);
+    return narrow_to_mask(&t->left, t->op == SLL ? mask >> n : mask << n & mask) ? simp_node(t, loop) : nullptr;
 }
 
 const RULE shift_rules[] = {shift_by_nothing, join_shifts,   shift_there_and_back,

@@ -172,6 +172,24 @@ void move_run(BBLK* first, BBLK* last, BBLK* behind) {
     (next ? next : entry)->rdflink = last;
 }
 
+// A body that ends in a jump ahead to its loop's test costs that jump in each round. Where nothing falls into it, it
+// moves in front of the test, and what stood there jumps once.
+void put_bodies_before_tests() {
+    std::vector<BBLK*> jumps;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (bb->branch() && bb->branch()->op == BRANCH && !falls_through(bb)) jumps.push_back(bb);
+    for (BBLK* bb : jumps) {
+        BBLK* test = bb->successors->first;
+        if (test->dfn <= bb->dfn || test->branch()->op != IF || falls_through(bb) || ends_in_promise(test->rdflink))
+            continue;
+        for (const EDGE* e = test->successors; e; e = e->rest) {
+            if (e->first->dfn > bb->dfn || end_of_run(e->first, test) != bb) continue;
+            move_run(e->first, bb, test->rdflink);
+            break;
+        }
+    }
+}
+
 // A test neither way of which is the next block costs a jump on one of them. Where the way out of a loop is fallen into
 // from nowhere, it moves here, and the way that stays in the loop is one conditional branch.
 void put_exits_behind_tests() {
@@ -210,6 +228,7 @@ void rotate_loops() {
     constexpr int SIZE_MATTERS_MOST = 1;
     if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
         close_loops_by_tests();
+        put_bodies_before_tests();
         put_exits_behind_tests();
         renumber_bblocks();
     }

@@ -13,7 +13,19 @@ int nested(int n) {
     return sum;
 }
 
+// Two loops in turn: each body stands in front of its test; a first test that is known to stay is not made.
+// FUNCTION: in_turn
+// COUNT 1: /^goto/
+// COUNT 2: /^if .* goto/
+int in_turn(int n) {
+    int sum = 0;
+    for (int i = 0; i < n; i++) sum += sum ^ i;
+    for (int i = 0; i < 9; i++) sum += sum ^ n;
+    return sum;
+}
+
 int main(void) {
+    put_i16(in_turn(4) + in_turn(0));
     for (int i = 0; i < 8; i++) g[i] = i * i;
     for (int n = -1; n < 7; n += 2) put_i16(nested(n));
     return 0;

@@ -32,7 +32,7 @@ TYPE* compared_form(TYPE* t) {
 }
 
 bool holds(TYPE* whole, TYPE* part) {
-    return whole->is_csu() && whole->is_complete() ? is_type_component_of_type(part, whole) : whole->is_csu();
+    return whole->is_csu() && (!whole->is_complete() || type_or_its_twin_is_component(part, whole));
 }
 
 } // namespace

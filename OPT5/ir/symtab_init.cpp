@@ -31,9 +31,19 @@ private:
         else if (t->is_array())
             visit_array(t, at);
         else if (t->is_csu())
-            for (const fkMDATA* m = t->mdata(); m && !done(); m = m->next) visit(m->type, at + static_cast<uint64_t>(m->offset));
+            for (const fkMDATA* m = t->mdata(); m && !done(); m = m->next)
+                visit_member(m, at + static_cast<uint64_t>(m->offset));
         else
             visit_scalar(t, at);
+    }
+
+    void visit_member(const fkMDATA* m, uint64_t at) {
+        if (!m->is_bitfld) {
+            visit(m->type, at);
+            return;
+        }
+        take_item();
+        if (at + m->width > offset) stop = true; // the item is the value of a part of the place
     }
 
     void visit_array(TYPE* t, uint64_t at) {
@@ -66,7 +76,8 @@ private:
         stop = true;
         if (!item || item->op == ENDINIT) return;
         const bool pointers = type->is_pointer() && item->type->is_pointer();
-        if (pointers || (t->size == type->size && compatible_types(promoted_type(item->type), promoted_type(type), true)))
+        if (pointers ||
+            (t->size == type->size && compatible_types(promoted_type(item->type), promoted_type(type), true)))
             found = copy_tree(item);
     }
 

@@ -41,6 +41,8 @@ bool symbol_is_immutable(const SYMTAB* sym);
 bool lvalue_is_immutable(const NODE* tree);
 bool bits_of_var_are_immutable(TYPE* type, int64_t start, int64_t width);
 bool is_type_component_of_type(TYPE* part, TYPE* whole);
+// The same for an integer whose signed or unsigned form, or an enumeration of it, is a component.
+bool type_or_its_twin_is_component(TYPE* part, TYPE* whole);
 bool is_field_member_of_type(const fkMDATA* field, TYPE* type);
 bool csu_type_has_only_simple_scalar_members(TYPE* t, int limit);
 bool type_is_contained_in_type(TYPE* part, TYPE* whole);

@@ -43,7 +43,7 @@ private:
     long hits = 0;
 };
 
-answer_cache component_answers, union_answers, alias_answers;
+answer_cache component_answers, twin_answers, union_answers, alias_answers;
 
 // Visits the types that objects of `t` hold, `t` included, each once; stops where `found` says so.
 template <class F>
@@ -87,6 +87,19 @@ bool is_type_component_of_type(TYPE* part, TYPE* whole) {
     whole = bare(whole);
     return component_answers.ask(part, whole, [part, whole] {
         return any_component(whole, [part](TYPE* t) { return same_component(part, t); });
+    });
+}
+
+bool type_or_its_twin_is_component(TYPE* part, TYPE* whole) {
+    if (is_type_component_of_type(part, whole)) return true;
+    part = bare(part);
+    if (!part->is_int() && !part->is_enum()) return false;
+    whole = bare(whole);
+    return twin_answers.ask(part, whole, [part, whole] {
+        TYPE* signed_form = bare(essential_type(part));
+        return any_component(whole, [signed_form](TYPE* t) {
+            return (t->is_int() || t->is_enum()) && same_component(signed_form, bare(essential_type(t)));
+        });
     });
 }
 
@@ -150,11 +163,7 @@ bool type_may_access_part_of(TYPE* access, TYPE* whole) {
     access = bare(access);
     if (access->is_void() || (access->is_csu() && !access->is_complete())) return true;
     if (access->is_int() && access->size <= tp->int_t->size) return true; // a character is no wider
-    if (is_type_component_of_type(access, whole)) return true;
-    if (!access->is_int() && !access->is_enum()) return false;
-    TYPE* signed_form = essential_type(access);
-    return is_type_component_of_type(signed_form, whole) ||
-           is_type_component_of_type(tp->mk_unsigned(signed_form), whole);
+    return type_or_its_twin_is_component(access, whole);
 }
 
 bool type_may_contain_volatile(TYPE* t) {
@@ -184,6 +193,7 @@ TYPE* type_of_nth_parameter(int n, const SYMTAB* sym) {
 void type_cache_stats() {
     if (!print_debug) return;
     component_answers.print("is_type_component_of_type");
+    twin_answers.print("type_or_its_twin_is_component");
     union_answers.print("types_contained_in_union");
     alias_answers.print("type_may_alias_type");
 }

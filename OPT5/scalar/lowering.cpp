@@ -4,7 +4,6 @@
 
 int GO_FOR_INSTRUMENTATION = 0;
 
-void expand_bitfields() {}
 void convert_sti_to_cinit() {}
 void expand_cluster_refs() {}
 void collect_clustered_symbols() {}

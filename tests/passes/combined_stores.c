@@ -106,8 +106,8 @@ void watched(void) {
 }
 
 // FUNCTION: fields
-// COUNT 1: _s.field =
-// HAS: _s.field = 2
+// HAS: *((unsigned int *)&_s + 2) = *((unsigned int *)&_s + 2) & 65504 | 2
+// NOT: _s
 void fields(void) {
     s.field = 1;
     s.field = 2;

@@ -13,9 +13,6 @@ struct link {
     struct link *next;
     int value;
 };
-struct flags {
-    unsigned low : 3, high : 5;
-};
 struct row {
     int n, cell[2];
 };
@@ -144,15 +141,6 @@ int overlaid(long x) {
     return w.half;
 }
 
-// FUNCTION: narrow
-// HAS: /\d+ f: struct flags/
-int narrow(int i) {
-    struct flags f;
-    f.low = (unsigned)i;
-    f.high = (unsigned)i;
-    return (int)(f.low + f.high);
-}
-
 // FUNCTION: indexed
 // HAS: /\d+ r: struct row/
 int indexed(int i) {
@@ -197,7 +185,6 @@ int main(void) {
     put_i16(passed(4));
     put_i16(returned(9).x);
     put_i16(overlaid(0x12345L));
-    put_i16(narrow(29));
     put_i16(indexed(3));
     put_i16(watched(2));
     passed_through(&p, &q);

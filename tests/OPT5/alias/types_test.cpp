@@ -35,6 +35,8 @@ TEST_F(Types, Table) {
         {c, l, false, true, true}, // a character may be a part of anything
         {uc, f, false, true, true},
         {c, l, true, true, false}, // unless it is a variable of its own
+        {make_union("fields", tp->ulong_t, i), tp->ulong_t, true, false, true}, // a part, whatever its sign
+        {make_union("fields", tp->ulong_t, i), l, true, false, true},
         {ptr(i), ptr(i), true, true, true},
         {ptr(i), ptr(l), true, true, false},
         {ptr(const_of(i)), ptr(i), true, true, true},

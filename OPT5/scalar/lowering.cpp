@@ -4,7 +4,6 @@
 
 int GO_FOR_INSTRUMENTATION = 0;
 
-void convert_sti_to_cinit() {}
 void expand_cluster_refs() {}
 void collect_clustered_symbols() {}
 void add_instrumentation_exit_routine_to_atexit() {}

@@ -37,33 +37,49 @@ bool may_count(const SYMTAB* sym) {
            !find_widened_symbol_entry(sym);
 }
 
-// The constant that `value` adds to the variable; 0 for another tree.
-int64_t added_constant(int op, const NODE* name, const NODE* c) {
-    if (c->op != ICON || !c->u.lval.fits<int32_t>()) return 0;
-    const TYPE* type = name->u.sym->type;
-    // What is computed in an unsigned or in a wider type wraps where the variable's own arithmetic does not.
-    if (type->is_int() && !type->is_unsigned() && (c->type->is_unsigned() || c->type->size > type->size)) return 0;
-    const int64_t by = c->u.lval.fits_in<int32_t>();
-    return op == PLUS ? by : -by;
+// What is added must be computed in the variable's own arithmetic: what is computed in an unsigned or in a wider type
+// wraps where a signed variable does not.
+bool fits_step(const TYPE* type, const NODE* added) {
+    if (!added->type->is_int() || added->type->is_bool()) return false;
+    if (type->is_pointer()) return added->type->size <= ADDRESS_BITS;
+    if (added->op == ICON && type->is_unsigned()) return true;
+    return added->type->size == type->size && added->type->is_unsigned() == type->is_unsigned();
 }
 
-int64_t step_of(const NODE* t) {
+bool as_step(const TYPE* type, int op, const NODE* added, INDUCTION::STEP* step) {
+    constexpr int MOST_NODES = 8;
+    if (!fits_step(type, added)) return false;
+    const int sign = op == PLUS ? 1 : -1;
+    if (added->op != ICON) {
+        step->by = sign;
+        step->amount = added;
+        return count_nodes_in_tree(added) <= MOST_NODES;
+    }
+    if (!added->u.lval.fits<int32_t>()) return false;
+    step->by = sign * added->u.lval.fits_in<int32_t>();
+    return step->by != 0;
+}
+
+bool is_step(const NODE* t, INDUCTION::STEP* step) {
     const NODE* name = t->left;
-    if (!name || name->op != NAME || !t->right) return 0;
+    if (!name || name->op != NAME || !t->right || !may_count(name->u.sym)) return false;
+    const TYPE* type = name->u.sym->type;
     switch (t->op) {
     case PLUSPLUS:
-    case PLUSASG: return added_constant(PLUS, name, t->right);
+    case PLUSASG: return as_step(type, PLUS, t->right, step);
     case MINMIN:
-    case MINUSASG: return added_constant(MINUS, name, t->right);
+    case MINUSASG: return as_step(type, MINUS, t->right, step);
     case ASG: {
         const NODE* sum = t->right;
-        if ((sum->op != PLUS && sum->op != MINUS) || sum->left->op != NAME || sum->left->u.sym != name->u.sym) return 0;
-        if (name->u.sym->type->is_int() && (sum->type->size != name->u.sym->type->size ||
-                                            sum->type->is_unsigned() != name->u.sym->type->is_unsigned()))
-            return 0;
-        return added_constant(sum->op, name, sum->right);
+        if (sum->op != PLUS && sum->op != MINUS) return false;
+        if (type->is_int() && (sum->type->size != type->size || sum->type->is_unsigned() != type->is_unsigned()))
+            return false;
+        const bool is_left = sum->left->op == NAME && sum->left->u.sym == name->u.sym;
+        if (is_left) return as_step(type, sum->op, sum->right, step);
+        return sum->op == PLUS && sum->right->op == NAME && sum->right->u.sym == name->u.sym &&
+               as_step(type, PLUS, sum->left, step);
     }
-    default: return 0;
+    default: return false;
     }
 }
 
@@ -86,6 +102,7 @@ LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all),
     if (!usable) return;
     keep_inductions();
     if (in_order.empty()) return;
+    order_steps();
     find_starts();
     find_tests();
     judge_wrapping();
@@ -97,7 +114,11 @@ LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all),
 void LOOP_FACTS::collect_assignments() {
     for (BBLK* bb : loop->blocks) {
         if (bb->is_in_LIR_form()) usable = false;
-        for (LIST* s = bb->statements; s && usable; s = s->rest) enter_statement(bb, s->first);
+        int n = 0;
+        for (LIST* s = bb->statements; s && usable; s = s->rest) {
+            enter_statement(bb, s->first);
+            place[s->first] = n++;
+        }
     }
 }
 
@@ -110,14 +131,16 @@ void LOOP_FACTS::enter_statement(BBLK* bb, NODE* t) {
     for_each_node(t, [this](const NODE* n) {
         if (n->op == NAME) ++names[n->u.sym];
     });
-    if (const int64_t by = step_of(t); by && may_count(t->left->u.sym)) {
+    INDUCTION::STEP step{bb, t, 0, nullptr};
+    if (is_step(t, &step)) {
         INDUCTION& induction = inductions[t->left->u.sym];
         induction.sym = t->left->u.sym;
         if (induction.steps.empty()) in_order.push_back(&induction);
-        induction.steps.push_back({bb, t, by});
+        induction.steps.push_back(step);
         ++assignments[induction.sym];
         return;
     }
+    if (t->op == ASG && t->left->op == NAME) definitions[t->left->u.sym] = {bb, t};
     for_each_node(t, [this](const NODE* n) {
         if (!n->left || !is_assignment(n->op)) return;
         if (const NODE* name = written_name(n->left)) ++assignments[name->u.sym];
@@ -143,6 +166,39 @@ void LOOP_FACTS::keep_inductions() {
 INDUCTION* LOOP_FACTS::induction(const SYMTAB* sym) {
     auto it = inductions.find(sym);
     return it == inductions.end() ? nullptr : &it->second;
+}
+
+// ---- Values of a round
+
+const LOOP_FACTS::DEFINITION* LOOP_FACTS::definition(const SYMTAB* sym) const {
+    auto it = definitions.find(sym);
+    if (it == definitions.end() || !is_private_scalar(sym) || assignments.at(sym) != 1) return nullptr;
+    return &it->second;
+}
+
+void LOOP_FACTS::look_at(const BBLK* bb, const NODE* statement) {
+    looking_in = bb;
+    looking_at = place.at(statement);
+}
+
+// The steps end their round: from each control goes to the header.
+void LOOP_FACTS::order_steps() {
+    steps_end_rounds = true;
+    for (const INDUCTION* i : in_order)
+        for (const INDUCTION::STEP& s : i->steps) {
+            steps_end_rounds &= !s.bb->successors->rest && s.bb->successors->first == loop->header;
+            int& first = first_step.emplace(s.bb, place.at(s.statement)).first->second;
+            first = std::min(first, place.at(s.statement));
+        }
+}
+
+const NODE* LOOP_FACTS::value_of(const SYMTAB* sym) {
+    const DEFINITION* d = is_induction(sym) ? nullptr : definition(sym);
+    if (!d || !steps_end_rounds) return nullptr;
+    if (auto step = first_step.find(looking_in); step != first_step.end() && step->second < looking_at) return nullptr;
+    const bool comes_first =
+        d->bb == looking_in ? place.at(d->statement) < looking_at : loops.dominates(d->bb, looking_in);
+    return comes_first ? d->statement->right : nullptr;
 }
 
 // ---- Invariants
@@ -268,7 +324,8 @@ void LOOP_FACTS::find_tests() {
         test.counter = induction(counter->u.sym);
         test.limit = limit;
         if (!limit->type->is_int() || !counter->type->is_int() || limit->type->size != counter->type->size ||
-            test.counter->steps.size() != 1 || !runs_once_a_round(test.counter->steps.front().bb))
+            test.counter->steps.size() != 1 || test.counter->steps.front().amount ||
+            !runs_once_a_round(test.counter->steps.front().bb))
             continue;
         const BBLK *yes = branch->right->left->lbl->bblock, *no = branch->right->right->lbl->bblock;
         if (loops.contains(loop, yes) == loops.contains(loop, no)) continue;

@@ -14,12 +14,13 @@ struct LIST;
 struct NATURAL_LOOP;
 class NATURAL_LOOPS;
 
-// A variable that every assignment of the loop steps by a constant, in a statement of its own.
+// A variable that every assignment of the loop steps by an invariant amount, in a statement of its own.
 struct INDUCTION {
     struct STEP {
         BBLK* bb;
         NODE* statement;
-        int64_t by;
+        int64_t by;         // 1 or -1 with an amount
+        const NODE* amount; // a part of the statement; null for the constant alone
     };
     SYMTAB* sym;
     std::vector<STEP> steps;
@@ -33,7 +34,7 @@ struct INDUCTION {
 struct LOOP_TEST {
     BBLK* bb = nullptr;
     NODE* branch = nullptr;       // the IF
-    INDUCTION* counter = nullptr; // which has one step in each round
+    INDUCTION* counter = nullptr; // which has one step in each round, by a constant
     const NODE* limit = nullptr;  // invariant
     int stay_op = 0;              // the loop goes on while `counter stay_op limit`
     bool stays_if_true = false;   // of the compare as it stands
@@ -54,6 +55,15 @@ public:
 
     bool is_induction(const SYMTAB* sym) const override { return inductions.count(sym) != 0; }
     bool is_invariant(const NODE* tree) override;
+    // Of a variable with one assignment in the loop, at the statement that `look_at` named: what that assigned in the
+    // same round, if no induction has stepped since.
+    const NODE* value_of(const SYMTAB* sym) override;
+    void look_at(const BBLK* bb, const NODE* statement);
+    struct DEFINITION {
+        BBLK* bb;
+        NODE* statement;
+    };
+    const DEFINITION* definition(const SYMTAB* sym) const; // the one assignment of the loop, if it is a statement
     bool stays_linear_when_widened(const SYMTAB* sym) const override;
 
 private:
@@ -61,6 +71,7 @@ private:
     void enter_statement(BBLK* bb, NODE* t);
     void enter_assignments(const NODE* t, const NODE* step);
     void keep_inductions();
+    void order_steps();
     void find_starts();
     void find_tests();
     bool runs_once_a_round(const BBLK* bb) const;
@@ -78,6 +89,12 @@ private:
     std::unordered_map<const SYMTAB*, int> names;
     std::unordered_map<const SYMTAB*, bool> unchanged; // other variables that were asked about
     std::vector<LOOP_TEST> exits;
+    std::unordered_map<const SYMTAB*, DEFINITION> definitions; // the last seen
+    std::unordered_map<const NODE*, int> place;                // of a statement in its block
+    const BBLK* looking_in = nullptr;
+    int looking_at = 0;
+    std::unordered_map<const BBLK*, int> first_step; // its place
+    bool steps_end_rounds = false;
     int questions_left = 16; // each looks at the whole loop
 };
 

@@ -90,6 +90,12 @@ private:
         if (--nodes_left < 0 || !is_plain_integer(t->type)) return false;
         switch (t->op) {
         case ICON: address.offset = sum(address.offset, product(k, t->u.lval.fits_in<int64_t>())); return true;
+        case NAME:
+            if (const NODE* value = in_value ? nullptr : leaves.value_of(t->u.sym))
+                if (is_plain_integer(value->type) && value->type->size == t->type->size &&
+                    value->type->is_unsigned() == t->type->is_unsigned())
+                    return of_value(value, k);
+            break;
         case PLUS:
             if (is_exact(t)) return integer(t->left, k) && integer(t->right, k);
             break;
@@ -114,6 +120,14 @@ private:
         default: break;
         }
         return leaf(t, k);
+    }
+
+    // What variables held where it was computed is not known here, but of inductions.
+    bool of_value(const NODE* value, int64_t k) {
+        in_value = true;
+        const bool is_linear = integer(value, k);
+        in_value = false;
+        return is_linear;
     }
 
     static int64_t value_of(const NODE* icon) { return icon->u.lval.fits_in<int64_t>(); }
@@ -144,6 +158,7 @@ private:
     LINEAR_LEAVES& leaves;
     LINEAR_ADDRESS& address;
     int nodes_left = MOST_NODES;
+    bool in_value = false;
 };
 
 } // namespace

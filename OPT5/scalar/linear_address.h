@@ -32,6 +32,8 @@ public:
     virtual ~LINEAR_LEAVES() = default;
     virtual bool is_induction(const SYMTAB* sym) const = 0;
     virtual bool is_invariant(const NODE* tree) = 0; // and may be evaluated ahead of the loop
+    // What the variable was set to, where that still is its value; null if that is not known.
+    virtual const NODE* value_of(const SYMTAB* sym) = 0;
     // Whether the value of a narrow induction also moves by its steps when it is widened.
     virtual bool stays_linear_when_widened(const SYMTAB* sym) const = 0;
 };

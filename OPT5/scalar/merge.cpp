@@ -81,6 +81,7 @@ public:
             for (LIST* s = bb->statements; s; s = s->rest) {
                 if (s->first->op == PPRAGMA) continue;
                 statement = s->first;
+                facts.look_at(bb, statement);
                 visit(&s->first->left);
                 visit(&s->first->right);
             }
@@ -151,6 +152,8 @@ private:
     void rewrite(GROUP& g);
     void rewrite_with_base(GROUP& g);
     void step_beside(const GROUP& g);
+    NODE* step_size(const INDUCTION::STEP& step, int64_t size);
+    SYMTAB* make_temporary(NODE* value);
     void replace(const GROUP& g, USE& use, NODE* by, int form);
     SYMTAB* make_pointer(TYPE* type, const LINEAR_ADDRESS& from, NODE* start);
     void map_test(const LOOP_TEST& test);
@@ -166,6 +169,7 @@ private:
     std::vector<GROUP> groups;
     const LOOP_TEST* mapped = nullptr;
     BBLK* ahead = nullptr;
+    std::map<std::pair<const NODE*, int64_t>, SYMTAB*> step_sizes; // looked up
     std::vector<NODE*> replaced; // their parts are the terms of addresses still to be made
 };
 
@@ -227,7 +231,7 @@ void MERGE::appraise(GROUP& g) {
         for (const INDUCTION::STEP& s : facts.induction(sym)->steps) {
             double w = loops.dominates_latches(s.bb, loop) ? 1 : 0.5;
             for (const NATURAL_LOOP* l = loops.around(s.bb); l && l != loop; l = l->parent) w *= 8;
-            stepping += STEP_COST * w;
+            stepping += (s.amount ? COUNTER_COST : STEP_COST) * w;
         }
     };
     if (base_moves) add_steps(g.address.base->u.sym);
@@ -350,14 +354,20 @@ NODE* MERGE::start_tree(const GROUP& g) {
 
 // What the pointer points into is what its start does, anywhere in it.
 SYMTAB* MERGE::make_pointer(TYPE* type, const LINEAR_ADDRESS& from, NODE* start) {
-    SYMTAB* sym = sym_temp('P', -1, type, nullptr);
-    sym->set_bitnum(NOT_A_CANDIDATE);
+    SYMTAB* sym = make_temporary(coerce_to_type(type, start));
     const SPMAP::SPINFO target = currfuninfo->spmap->pointee_of(from.base);
     if (target.object)
         currfuninfo->spmap->set_mapping(sym, target.object, INT65(0), size_in_units(target.object), false);
     else
         currfuninfo->spmap->set_bottom(sym);
-    put_at_end(ahead, maketree(ASG, mk_NAME(sym), start, type));
+    return sym;
+}
+
+SYMTAB* MERGE::make_temporary(NODE* value) {
+    TYPE* type = value->type->stqs();
+    SYMTAB* sym = sym_temp('P', -1, type, nullptr);
+    sym->set_bitnum(NOT_A_CANDIDATE);
+    put_at_end(ahead, maketree(ASG, mk_NAME(sym), value, type));
     return sym;
 }
 
@@ -386,6 +396,19 @@ void MERGE::replace(const GROUP& g, USE& use, NODE* by, int form) {
     replaced.push_back(old);
 }
 
+// The step of a pointer, `size` times that of the induction: an amount is multiplied ahead of the loop.
+NODE* MERGE::step_size(const INDUCTION::STEP& step, int64_t size) {
+    if (!step.amount) return mk_ICON(INT65(size), size <= 32767 ? tp->int_t : tp->long_t);
+    if (size == 1 && step.amount->op == NAME) return copy_tree(step.amount);
+    SYMTAB*& sym = step_sizes[{step.statement, size}];
+    if (!sym) {
+        NODE* amount = coerce_to_type(tp->long_t, copy_tree(step.amount));
+        if (size != 1) amount = maketree(MULT, amount, mk_ICON(INT65(size), tp->long_t), tp->long_t);
+        sym = make_temporary(simp_tree(amount, nullptr));
+    }
+    return mk_NAME(sym);
+}
+
 void MERGE::step_beside(const GROUP& g) {
     auto add = [&](const INDUCTION& i, int64_t coefficient) {
         for (const INDUCTION::STEP& step : i.steps) {
@@ -393,9 +416,8 @@ void MERGE::step_beside(const GROUP& g) {
             while (s->first != step.statement) s = s->rest;
             s->rest = mkelist(step.statement, s->rest, s->psn);
             const int64_t by = coefficient * step.by;
-            const int64_t size = by < 0 ? -by : by;
-            NODE* c = mk_ICON(INT65(size), size <= 32767 ? tp->int_t : tp->long_t);
-            s->first = maketree(by < 0 ? MINUSASG : PLUSASG, mk_NAME(g.sym), c, g.type, step.statement->ls);
+            s->first = maketree(by < 0 ? MINUSASG : PLUSASG, mk_NAME(g.sym), step_size(step, by < 0 ? -by : by), g.type,
+                                step.statement->ls);
         }
     };
     const LINEAR_ADDRESS& a = g.address;

@@ -73,6 +73,30 @@ void members(int n) {
     }
 }
 
+// By an amount that stays, and through a variable that each round sets anew; not by the value of the round before.
+// FUNCTION: butterfly
+// COUNT 4: += $O$P
+// COUNT 0: k =
+void butterfly(int half) {
+    for (int i = 0; i < 32; i += half * 2) {
+        int k = i + half;
+        w[i] = w[i] + w[k];
+        a[i] = a[k] ^ a[i];
+        w[k] ^= a[k];
+    }
+}
+
+// FUNCTION: late
+// COUNT 1: k = m + 1
+void late(int n) {
+    int k = 3, m = 0;
+    for (int i = 0; i < n; i++) {
+        k = m + 1;
+        m = i;
+        w[k] = w[k] + b[m];
+    }
+}
+
 // It is read behind the loop.
 // FUNCTION: found
 // COUNT 1: i += 1
@@ -148,7 +172,10 @@ int main(void) {
     put_i16(chosen(20));
     smooth(30);
     members(40);
-    put_i32(w[29] + pairs[39].x + pairs[3].y);
+    butterfly(1);
+    butterfly(4);
+    late(20);
+    put_i32(w[29] + w[7] * 3 + w[12] + a[8] +  pairs[39].x + pairs[3].y);
     put_i16(found(203));
     put_i32(wraps(3, w, 1) + bounded(9) + kept_volatile(9) + kept_aliased(9) + promised(4));
     return 0;

@@ -14,6 +14,7 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
 
+#include <algorithm>
 #include <map>
 #include <unordered_set>
 #include <vector>
@@ -75,6 +76,18 @@ NODE* zero_of(TYPE* type) {
     return mk_ICON(INT65(0), type);
 }
 
+bool is_zero(const NODE* item) {
+    while ((item->op == PCONV || item->op == SCONV) && item->left) item = item->left;
+    if (item->op == FCON) return item->u.fval && f_is_zero(item->u.fval) && item->u.fval->sign == 0;
+    return item->op == ENDINIT || (item->op == ICON && item->u.lval.is_zero());
+}
+
+// Nothing but the zeros that storage starts with.
+bool starts_as_zero(const SYMTAB* s) {
+    if (!s->autoinit) return !s->init_value;
+    return std::all_of(s->autoinit->begin(), s->autoinit->end(), is_zero);
+}
+
 class CONVERSION {
 public:
     void run() {
@@ -107,7 +120,7 @@ private:
 
     static bool may_be_given_a_value(const SYMTAB* s) {
         if (s->level != 0 || (s->sclass != SC_STATIC && s->sclass != SC_EXTDEF) || s->is_function()) return false;
-        if (s->autoinit || s->init_value || s->pragma || s->is_clustered || s->cqual & CQ_GLOBAL_REGISTER) return false;
+        if (!starts_as_zero(s) || s->pragma || s->is_clustered || s->cqual & CQ_GLOBAL_REGISTER) return false;
         return s->sclass == SC_STATIC || s->dynamic_init || no_outside_writers;
     }
 
@@ -164,7 +177,13 @@ private:
     }
 
     void initialize(SYMTAB* s) {
-        s->autoinit = new std::vector<NODE*>;
+        if (s->autoinit)
+            for (NODE* item : *s->autoinit) erase_tree(item);
+        else
+            s->autoinit = new std::vector<NODE*>;
+        s->autoinit->clear();
+        if (s->init_value) erase_tree(s->init_value);
+        s->init_value = nullptr;
         for (const SCALAR& scalar : objects[s->index])
             s->autoinit->push_back(scalar.value ? scalar.value : zero_of(scalar.type));
         s->autoinit->push_back(new_node(ENDINIT, tp->int_t));
@@ -178,10 +197,18 @@ private:
     bool goes_on = true;
 };
 
+// A function of the program, and not only the start-up code, calls it.
+bool is_called_by_program(const FUNINFO* f) {
+    for (const FUNINFO* caller : fileinfo.FUNLIST)
+        for (const CALLEE* c = caller->symbol ? caller->callees : nullptr; c; c = c->next)
+            if (c->callee == f) return true;
+    return false;
+}
+
 } // namespace
 
 void convert_sti_to_cinit() {
     const FUNINFO* f = currfuninfo;
-    if (!fun_is_cpp_static_initializer(f) || f->ncallers > 0 || !f->bb_list || f->bb_list->predecessors) return;
+    if (!fun_is_cpp_static_initializer(f) || !f->bb_list || f->bb_list->predecessors || is_called_by_program(f)) return;
     CONVERSION().run();
 }

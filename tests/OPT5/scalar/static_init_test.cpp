@@ -24,7 +24,6 @@ protected:
         for (SYMTAB* s : made) delete s;
         global_symbols = nullptr;
         file_symbols_are_known = false;
-        currfuninfo->ncallers = 0;
         FunctionTest::TearDown();
     }
     SYMTAB* global(const char* name, TYPE* type = tp->int_t, unsigned cqual = CQ_REFERENCED | CQ_WRITTEN,
@@ -73,6 +72,8 @@ TEST_F(StaticInit, ConstantsAheadOfEverythingElse) {
     SYMTAB *a = global("a"), *wide = global("w", tp->long_t), *v = global("v", tp->mk_array(tp->int_t, false, 4, true));
     SYMTAB *p = global("p", tp->mk_ptr(tp->int_t)), *f = global("f", tp->mk_array(tp->float_t, false, 2, true));
     a->dynamic_init = true;
+    wide->autoinit = new std::vector<NODE*>{icon(0, tp->long_t), new_node(ENDINIT, tp->int_t)};
+    v->autoinit = new std::vector<NODE*>{new_node(ENDINIT, tp->int_t)};
     add(mk_ASG(mk_NAME(a), icon(5)));
     add(mk_ASG(element(v, 2), icon(7)));
     add(mk_ASG(mk_NAME(p), maketree(UAND, mk_NAME(a), nullptr, p->type)));
@@ -112,10 +113,12 @@ TEST_F(StaticInit, WhatStays) {
 }
 
 TEST_F(StaticInit, OnlyThatFunctionAndOnlyOnce) {
-    SYMTAB* a = global("a");
+    SYMTAB *a = global("a"), *caller = global("caller", function_type());
+    CALLEE edge{currfuninfo, 1, nullptr};
+    make_FUNINFO(caller)->callees = &edge;
     add(mk_ASG(mk_NAME(a), icon(5)));
-    currfuninfo->ncallers = 1;
     run();
+    make_FUNINFO(caller)->callees = nullptr;
     EXPECT_EQ(items(a), "none");
 }
 

@@ -3,6 +3,9 @@
 // One walk over each block against the order of evaluation, with the set of variables that are live at the point. What
 // a dead assignment computes stays for its effects. Variables that only die because an assignment went are found by the
 // next call: the sets of the other blocks are not recomputed, which leaves them too large and so safe.
+//
+// A counter that nothing but its own steps reads would keep itself alive around its loop. So would any ring of
+// variables that only feed each other: they are found without regard to flow, and their reads don't count.
 
 #include "OPT5/scalar/eda.h"
 
@@ -69,12 +72,62 @@ NODE* make_swap(const NODE* a, const NODE* b) {
 
 bool target_swaps_floats() { return (float_support | 1) == 11 && cpu_version == 28 && find_BIF_descriptor("__swapf"); }
 
+// ---- Variables whose values reach nothing
+
+class FAINT_VARIABLES {
+public:
+    BITVEC find() {
+        needed = BITVEC(static_cast<uint32_t>(currfuninfo->lva_sym_count));
+        feeds.resize(needed.bits);
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (LIST* s = bb->statements; s; s = s->rest) statement(s->first);
+        while (!work.empty()) {
+            const uint32_t bit = work.back();
+            work.pop_back();
+            for (uint32_t source : feeds[bit]) need(source);
+        }
+        BITVEC faint(needed.bits);
+        faint.set_all();
+        faint -= needed;
+        return faint;
+    }
+
+private:
+    // What an assignment without other effects reads is needed if its target is, all else at once.
+    void statement(NODE* t) {
+        const bool assigns = t->op == ASG || t->op == PLUSPLUS || t->op == MINMIN || op_of_opASG[t->op] != ILLOP;
+        const int target = assigns && t->left->op == NAME ? live_index(t->left->u.sym) : -1;
+        const bool is_pure = target >= 0 && !tree_has_side_effects(t->right) && !tree_is_arg_prolog(t);
+        for_each_node(is_pure ? t->right : t, [&](const NODE* n) {
+            const int bit = n->op == NAME ? live_index(n->u.sym) : -1;
+            if (bit < 0) return;
+            if (is_pure)
+                feeds[static_cast<size_t>(target)].push_back(static_cast<uint32_t>(bit));
+            else
+                need(static_cast<uint32_t>(bit));
+        });
+    }
+
+    void need(uint32_t bit) {
+        if (needed.test(bit)) return;
+        needed.set(bit);
+        work.push_back(bit);
+    }
+
+    BITVEC needed;
+    std::vector<std::vector<uint32_t>> feeds; // by the variable assigned to: what its values are made of
+    std::vector<uint32_t> work;
+};
+
 class ELIMINATION final : public BACKWARD_WALK {
 public:
     int count = 0;
 
+    ELIMINATION() : faint(FAINT_VARIABLES().find()) {}
+
     void run(BBLK* bb) {
         start_from_successors(bb);
+        live -= faint;
         *bb->live_sets[LIVE_OUT] = live;
         std::vector<LIST*> cells;
         for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
@@ -145,7 +198,9 @@ private:
         return copy;
     }
 
-    void read(int bit) override { live.set(static_cast<uint32_t>(bit)); }
+    void read(int bit) override {
+        if (!faint.test(static_cast<uint32_t>(bit))) live.set(static_cast<uint32_t>(bit));
+    }
     bool write(int bit, bool kills) override {
         if (!live.test(static_cast<uint32_t>(bit))) return false;
         if (kills) live.clear(static_cast<uint32_t>(bit));
@@ -154,6 +209,7 @@ private:
     void removed() override { ++count; }
 
     BITVEC live;
+    const BITVEC faint; // never live
     const bool swaps = target_swaps_floats();
 };
 
@@ -205,7 +261,7 @@ bool combine_assignments(LIST* cell) {
     return true;
 }
 
-int elim_dead_assigns(bool keep_embedded, bool) {
+int elim_dead_assigns(bool keep_embedded, bool early) {
     FUNINFO* f = currfuninfo;
     if (!f || !f->bb_list) return 0;
     sym_split(f);
@@ -224,12 +280,45 @@ int elim_dead_assigns(bool keep_embedded, bool) {
         if (graph_changed) promote_all_embedded_assignments();
     }
     lva_cleanup();
-    if (!f->bb_list->loop && (graph_changed || (elimination.count && some_block_only_jumps()))) simpcfg(false, false);
+    if (!early && !f->bb_list->loop && (graph_changed || (elimination.count && some_block_only_jumps()))) simpcfg(false, false);
     return elimination.count;
 }
 
-// The counters of a loop and their kinds are known to the loop analysis; without it there is nothing to do.
-void elim_locally_dead_assignments_in_bb(BBLK*, struct LOOP*) {}
+// ---- Counters
+
+bool (*is_loop_counter)(const SYMTAB* sym, const struct LOOP* loop) = nullptr;
+
+namespace {
+
+class COUNTER_STEPS final : public BACKWARD_WALK {
+public:
+    COUNTER_STEPS(BBLK* bb, const struct LOOP* loop) : live(*bb->live_sets[LIVE_OUT]), is_counter(live.bits) {
+        for (LIST* s = bb->statements; s; s = s->rest)
+            for_each_node(s->first, [&](const NODE* t) {
+                const int bit = t->op == NAME ? live_index(t->u.sym) : -1;
+                if (bit >= 0 && is_loop_counter(t->u.sym, loop)) is_counter.set(static_cast<uint32_t>(bit));
+            });
+    }
+
+private:
+    void read(int bit) override { live.set(static_cast<uint32_t>(bit)); }
+    bool write(int bit, bool kills) override {
+        const bool is_live = live.test(static_cast<uint32_t>(bit));
+        if (kills) live.clear(static_cast<uint32_t>(bit));
+        return is_live || !is_counter.test(static_cast<uint32_t>(bit));
+    }
+
+    BITVEC live;
+    BITVEC is_counter;
+};
+
+} // namespace
+
+void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop) {
+    if (!loop || !is_loop_counter || !bb->live_sets[LIVE_OUT]) return;
+    COUNTER_STEPS(bb, loop).block(bb);
+    drop_empty_cells(&bb->statements);
+}
 
 namespace {
 

@@ -25,11 +25,12 @@ int live_index(const SYMTAB* sym);
 // ---- Dead assignments
 // Removes assignments whose value no path reads, takes assignments out of expressions, and delays those that only one
 // way out of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments went.
-// `early` is given by all callers as 0 or by the propagation of constants as 1, and says that the graph may be
-// simplified at the end.
+// With `early` the graph is left to the caller to simplify.
 int elim_dead_assigns(bool keep_embedded, bool early);
-// In the latch of `loop`: compound assignments to its counters whose value no one reads become plain arithmetic.
+// In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads go.
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop);
+// Whether a variable is an induction variable of the loop that has no use but to count; null while no loops are known.
+extern bool (*is_loop_counter)(const SYMTAB* sym, const struct LOOP* loop);
 // `x = e; y = x;` with `x` not read again becomes `y = e` in the first cell.
 bool combine_assignments(LIST* cell);
 // A destructor need not store to members that no later statement reads.

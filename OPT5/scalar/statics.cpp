@@ -48,7 +48,11 @@ public:
         drop_what_initializers_name();
         for_each_statement([this](const NODE* t) { drop_what_is_not_plain(t); });
         find_unwritten_reads();
-        for (SYMTAB* sym : candidates) sym->fl_static_eligible = sym->fl_static_candidate;
+        for (SYMTAB* sym : candidates) {
+            sym->fl_static_eligible = sym->fl_static_candidate;
+            if (print_debug && sym->fl_static_eligible)
+                debug_printf("\t%s:%s (eligible for promotion to 'auto')\n", currfuninfo->name.c_str(), sym->name);
+        }
     }
 
 private:

@@ -40,6 +40,24 @@ int on_one_way(int y) {
     return 2;
 }
 
+// Counters that feed themselves, and a ring; one that a call and one that the result needs stay.
+// FUNCTION: counters
+// NOT: own
+// NOT: ring
+// COUNT 1: _step(called
+// COUNT 1: kept += 1
+int counters(int* p, int n) {
+    int own = 0, ring1 = 1, ring2 = n, called = 2, kept = 3;
+    for (int i = 0; i < n; ++i) {
+        own += p[i];
+        ring1 = ring1 * 3 + ring2;
+        ring2 = ring1 ^ 5;
+        called = step(called);
+        kept++;
+    }
+    return kept;
+}
+
 // FUNCTION: conditional
 // HAS: x = 5
 int conditional(int y) {
@@ -102,5 +120,7 @@ int main(void) {
     put_i16(embedded(8));
     put_i16(old_value(6));
     put_i16(not_past_a_read());
+    put_i16(counters((int[]){4, 5, 6}, 3));
+    put_i16(g);
     return 0;
 }

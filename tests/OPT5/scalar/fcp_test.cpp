@@ -3,6 +3,7 @@
 #include "../ir/function_fixture.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
 #include "OPT5/simp/simp.h"
 
@@ -194,6 +195,29 @@ TEST_F(FcpTest, GlobalsThatNeverChange) {
         erase_tree(t);
         delete g;
     }
+}
+
+// A step of a loop's counter goes where the value isn't read any more; what else is dead is left for later.
+TEST_F(FcpTest, CountersLoseTheStepsThatNoOneReads) {
+    SYMTAB *i = local("i"), *k = local("k"), *n = local("n");
+    set(n, fresh());
+    set(i, mk_NAME(n));
+    set(k, mk_NAME(n));
+    add(maketree(PLUSASG, mk_NAME(i), icon(1), tp->int_t));
+    set(n, mk_NAME(i));
+    add(maketree(PLUSASG, mk_NAME(i), icon(2), tp->int_t));
+    add(maketree(PLUSASG, mk_NAME(k), icon(3), tp->int_t));
+    ret(n);
+    build();
+    auto* loop = reinterpret_cast<struct LOOP*>(i);
+    is_loop_counter = [](const SYMTAB* sym, const struct LOOP* l) { return reinterpret_cast<const SYMTAB*>(l) == sym; };
+    find_live_variables(0, false);
+    elim_locally_dead_assignments_in_bb(currfuninfo->bb_list, loop);
+    lva_cleanup();
+    is_loop_counter = nullptr;
+    EXPECT_TRUE(says("i += 1") && says("k += 3")) << text();
+    EXPECT_FALSE(says("i += 2")) << text();
+    EXPECT_TRUE(valid());
 }
 
 } // namespace

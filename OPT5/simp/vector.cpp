@@ -46,14 +46,25 @@ bool all_are_one_number(const std::vector<NODE*>& lanes) {
 
 } // namespace
 
-// A pack of every lane. One operand for all is VPACKM; all fields of a vector in their order are that vector.
+// One operand for all lanes is VPACKM, one for the first and one for the others VPACK1P; all fields of a vector in
+// their order are that vector.
 NODE* simp_vector_pack(NODE* t) {
-    if (t->op != VPACK || !t->type->is_vector() || t->type->is_predicate()) return t;
+    if (!t->type->is_vector() || t->type->is_predicate()) return t;
+    if (t->op == VPACK1P) {
+        if (!is_number(t->left) || !same_value(t->left, t->right)) return t;
+        erase_node(t->right);
+        return to_unary(t, VPACKM, t->left);
+    }
+    if (t->op != VPACK) return t;
     const std::vector<NODE*> lanes = operands_of(t->left);
     const uint32_t n = lanes_of(t->type);
     if (lanes.size() == 1 && n > 1) {
         t->op = VPACKM;
         return t;
+    }
+    if (lanes.size() == 2 && n > 2) {
+        erase_node(t->left);
+        return simp_vector_pack(to_binary(t, VPACK1P, lanes[0], lanes[1]));
     }
     if (lanes.size() != n) return t;
     NODE* whole = packed_vector(t, lanes);
@@ -68,22 +79,34 @@ NODE* simp_vector_pack(NODE* t) {
     return to_unary(t, VPACKM, lane);
 }
 
-// A field of a pack is the operand that was packed there.
+namespace {
+
+// What a pack holds in lane i; null of what is no pack, or has effects in another lane.
+const NODE* packed_lane(const NODE* v, INT65 i) {
+    if (v->op == VPACKM) return v->left;
+    if (!is_pure(v)) return nullptr;
+    if (v->op == VPACK1P) return i.is_zero() ? v->left : v->right;
+    if (v->op != VPACK) return nullptr;
+    const std::vector<NODE*> lanes = operands_of(v->left);
+    return lanes.size() == lanes_of(v->type) ? lanes[static_cast<std::size_t>(i.value)] : nullptr;
+}
+
+} // namespace
+
+// A field of a pack is the operand that was packed there; of a pack under a cast, that operand under the lanes' cast.
 NODE* simp_vector_VFIELD(NODE* t) {
     NODE* v = t->left;
-    if (!is_icon(t->right) || t->right->u.lval.is_negative()) return t;
-    if (v->op == VPACKM) {
-        if (!compatible_types(v->left->type, t->type, true)) return t;
-        erase_tree(t->right);
-        return take_left(take_left(t));
-    }
-    if (v->op != VPACK || !is_pure(v)) return t;
-    const std::vector<NODE*> lanes = operands_of(v->left);
+    if (!is_icon(t->right) || !v->type->is_vector()) return t;
     const INT65 i = t->right->u.lval;
-    if (lanes.size() != lanes_of(v->type) || i >= INT65(static_cast<long>(lanes.size()))) return t;
-    const NODE* lane = lanes[static_cast<std::size_t>(i.value)];
-    if (!compatible_types(lane->type, t->type, true)) return t;
-    return replace_by(t, copy_tree(lane));
+    if (i.is_negative() || i >= INT65(lanes_of(v->type))) return t;
+    const bool is_cast = v->op == VSCONV && v->left->type->is_vector();
+    const NODE* lane = packed_lane(is_cast ? v->left : v, i);
+    if (!lane || !compatible_types((is_cast ? v->left : v)->type->elem_type(), lane->type, true)) return t;
+    NODE* value = copy_tree(lane);
+    if (is_cast) value = coerced(normalized_value_type(v->type->elem_type()->stqs()), value, nullptr);
+    TYPE* type = t->type;
+    erase_tree(t);
+    return coerced(type, value, nullptr);
 }
 
 // The bits as another type of the same size.
@@ -92,7 +115,18 @@ NODE* simp_vector_VRCONV(NODE* t) {
     return exact_types(t->type, t->left->type) ? take_left(t) : t;
 }
 
-NODE* simp_vector_VSCONV(NODE* t) { return exact_types(t->type, t->left->type) ? take_left(t) : t; }
+// Lane by lane; of one value for all lanes once.
+NODE* simp_vector_VSCONV(NODE* t) {
+    if (exact_types(t->type, t->left->type)) return take_left(t);
+    NODE* pack = t->left;
+    if (pack->op != VPACKM || !t->type->is_vector() || t->type->is_predicate() || pack->type->is_predicate() ||
+        !compatible_types(pack->type->elem_type(), pack->left->type, true))
+        return t;
+    TYPE* elem = normalized_value_type(t->type->elem_type()->stqs());
+    pack->left = coerced(elem, pack->left, nullptr);
+    pack->type = t->type;
+    return take_left(t);
+}
 
 // Of a mask, whose lanes are truth values.
 NODE* simp_vector_node(NODE* t) {

@@ -210,7 +210,8 @@ const XNODE* COMPILER::update_lanes(const IC_NODE* n, int opcode) {
 const XNODE* COMPILER::parts(const IC_NODE* n) {
     TYPE* t = n->type->real;
     const bool complex = n->op == op::COMPLEX && t->is_complex();
-    const bool vector = (n->op == op::VPACK || n->op == op::VPACKM) && t->is_vector();
+    const bool pair = n->op == op::VPACK1P; // the first lane, and all others
+    const bool vector = (n->op == op::VPACK || n->op == op::VPACKM || pair) && t->is_vector();
     if (!complex && !vector) return lanes(n, n->op);
     if (!f) return unsupported(n);
     PACK* k = p.make<PACK>();
@@ -226,8 +227,8 @@ const XNODE* COMPILER::parts(const IC_NODE* n) {
             lanes.push_back(list);
     };
     collect(collect, n->left);
-    if (complex) collect(collect, n->right);
-    if (lanes.size() != 1 && lanes.size() != k->count) return unsupported(n);
+    if (complex || pair) collect(collect, n->right);
+    if (lanes.size() != 1 && lanes.size() != k->count && !pair) return unsupported(n);
     for (const IC_NODE* lane : lanes) k->lanes.push_back(value_as(lane, k->lane));
     k->slot = slot(uint64_t{k->count} * k->lane.units);
     XNODE* x = p.node(pack);

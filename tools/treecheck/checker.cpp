@@ -168,6 +168,9 @@ void fill_memory(MEMORY* memory, int n, RANDOM& random) {
         const uint32_t at = world().address(s);
         if (s->type->is_pointer())
             put(memory, at, some_address(const_cast<TYPE*>(s->type)->type_pointed_to(), random), 2);
+        else if (s->type->is_complex())
+            for (uint32_t part = 0, units = static_cast<uint32_t>(s->type->size) / 32; part < 2; ++part)
+                put(memory, at + part * units, scalar_content(s->type->part_type(), n, random), units);
         else if (s->type->is_scalar())
             put(memory, at, scalar_content(s->type, n, random), s->type->size / 16);
         else
@@ -225,7 +228,7 @@ std::string TRIAL::contents(int assignment) const {
     begin(&e, assignment);
     std::set<std::string> lines;
     for_each_node(const_cast<NODE*>(tree), [&](const NODE* t) {
-        if (t->op != NAME || !t->type->is_scalar() || t->type->is_volatile()) return;
+        if (t->op != NAME || !form_of(t->type).bits || t->type->is_volatile()) return;
         lines.insert(std::string(t->u.sym->name) + " = " + value_text(e.eval(t), form_of(t->type)));
     });
     std::string s;

@@ -12,6 +12,7 @@ namespace {
 
 FORM make_form(const TYPE* type) {
     FORM f;
+    if (type->is_complex() || type->is_vector()) return f; // no scalar
     if (type->is_pointer() || type->is_ref()) {
         f.is_pointer = true;
         f.bits = 32;
@@ -501,6 +502,14 @@ BITS EVALUATOR::eval(const NODE* t) {
         return convert(write(p, stored), p.form, own);
     }
     case STASG: copy_record(t); return 0;
+    case MEMCPY: return copy_memory(t);
+    case REAL:
+    case IMAG:
+    case VFIELD: {
+        const std::vector<BITS> all = lanes(t->left);
+        const BITS i = t->op == VFIELD ? eval(t->right) : t->op == IMAG;
+        return undefined || i >= all.size() ? fail() : all[i];
+    }
     case ICALL: return intrinsic(t);
     case CALL:
     case UCALL: return call(t);

@@ -89,6 +89,8 @@ private:
     BITS intrinsic(const NODE* t);
     void arguments(const NODE* list, BITS* hash);
     void copy_record(const NODE* t);
+    BITS copy_memory(const NODE* t);
+    std::vector<BITS> lanes(const NODE* t); // of a vector; the parts of a complex number
 
     const WORLD& w = world();
     unsigned steps = 0;

@@ -206,6 +206,13 @@ NODE* GENERATOR::call(SYMTAB* function, int depth) {
 // Something with a side effect, as a value.
 NODE* GENERATOR::effect(TYPE* type, int depth) {
     NODE* t;
+    if (options.pointers && depth > 0 && random.one_in(16)) {
+        TYPE* p = tp->mk_ptr(tp->int_t);
+        NODE *to = pointer(p, depth - 1), *from = random.one_in(4) ? copy_tree(to) : pointer(p, depth - 1);
+        NODE* args =
+            binary(COMMA, binary(COMMA, to, from, tp->int_t), mk_ICON(INT65(random.pick(3)), tp->ulong_t), tp->int_t);
+        return binary(COMMAOP, unary(MEMCPY, args, p), leaf(type), type);
+    }
     if (random.one_in(16)) {
         NODE* copy = binary(STASG, mk_NAME(w.record), mk_NAME(w.other_record), w.record_type);
         return binary(COMMAOP, copy, leaf(type), type);
@@ -256,6 +263,45 @@ NODE* GENERATOR::extremum(TYPE* type, int depth) {
     NODE *a = operand(type, depth), *b = random.one_in(2) ? constant(type) : operand(type, depth);
     if (random.one_in(3)) std::swap(a, b);
     return mk_ICALL(name, binary(COMMA, a, b, tp->int_t), type);
+}
+
+// ---- Values of several parts
+NODE* GENERATOR::part(TYPE* type, int depth) {
+    TYPE* complex = tp->mk_complex(type);
+    NODE* z = random.pick(3) ? binary(COMPLEX, operand(type, depth), operand(type, depth), complex)
+                             : mk_NAME(w.complexes[type == tp->double_t]);
+    if (options.effects && random.one_in(8)) z = binary(COMMAOP, effect(tp->int_t, depth - 1), z, z->type);
+    return unary(random.pick(2) ? REAL : IMAG, z, type);
+}
+
+NODE* GENERATOR::vector(TYPE* type, int depth) {
+    TYPE* elem = type->elem_type();
+    const unsigned n = type->real->num_elem();
+    const unsigned kind = depth > 0 ? random.pick(8) : 7;
+    if (kind == 0) return unary(VPACKM, operand(elem, depth), type);
+    if (kind == 1) return binary(VPACK1P, operand(elem, depth), operand(elem, depth), type);
+    if (kind == 2 && n == 2) { // lane by lane from the other element type
+        TYPE* other = elem == tp->int_t ? tp->long_t : tp->int_t;
+        return unary(VSCONV, vector(tp->mk_vector(other, false, 2), depth - 1), type);
+    }
+    if (kind == 3 && type->size == 64) { // the same words
+        TYPE* other = elem == tp->int_t ? tp->mk_vector(tp->long_t, false, 2) : tp->mk_vector(tp->int_t, false, 4);
+        return unary(VRCONV, vector(other, depth - 1), type);
+    }
+    if (kind < 7) {
+        const unsigned lanes = random.one_in(4) ? 1 + random.pick(2) : n;
+        NODE* list = operand(elem, depth);
+        for (unsigned i = 1; i < lanes; ++i)
+            list = binary(COMMA, list, random.one_in(3) ? constant(elem) : operand(elem, depth), tp->int_t);
+        return unary(VPACK, list, type);
+    }
+    return mk_NAME(w.vectors[elem == tp->long_t ? 2 : n == 4]);
+}
+
+NODE* GENERATOR::lane(TYPE* type, int depth) {
+    const unsigned n = type == tp->int_t && random.pick(2) ? 4 : 2;
+    return binary(VFIELD, vector(tp->mk_vector(type, false, n), depth - 1), mk_ICON(INT65(random.pick(n)), tp->int_t),
+                  type);
 }
 
 NODE* GENERATOR::choice(TYPE* type, int depth) {
@@ -355,6 +401,9 @@ NODE* GENERATOR::integer(TYPE* type, int depth) {
             return unary(UMULT, pointer(tp->mk_ptr(type), depth - 1), type);
         break;
     case 7: return cast_to(type, member(random.pick(3) != 0, depth));
+    case 8:
+        if ((type == tp->int_t || type == tp->long_t) && random.one_in(3)) return lane(type, depth);
+        break;
     }
     if (computes(type)) return integer_operator(type, depth);
     TYPE* wide = promoted_type(type);
@@ -371,6 +420,10 @@ NODE* GENERATOR::floating(TYPE* type, int depth) {
     case 2: erase_tree(a); return cast_to(type, operand(random.of(w.integer_types), depth));
     case 3: erase_tree(a); return cast_to(type, operand(type == tp->float_t ? tp->double_t : tp->float_t, depth));
     case 4: erase_tree(a); return choice(type, depth);
+    case 6:
+        if (random.pick(2)) break;
+        erase_tree(a);
+        return part(type, depth);
     case 5: return random.pick(3) ? unary(random.pick(2) ? SQRT : RECIP, a, type) : a;
     }
     NODE* b = random.one_in(2) ? constant(type) : random.one_in(8) ? copy_tree(a) : operand(type, depth);

@@ -68,6 +68,9 @@ private:
     NODE* pointer(TYPE* type, int depth);
     NODE* choice(TYPE* type, int depth);
     NODE* extremum(TYPE* type, int depth);
+    NODE* part(TYPE* type, int depth);   // of a complex number
+    NODE* vector(TYPE* type, int depth); // of this vector type
+    NODE* lane(TYPE* type, int depth);   // of a vector of `int` or `long`
     NODE* choice_by_value(TYPE* type, int depth);
     NODE* effect(TYPE* type, int depth);
     NODE* assignment(NODE* place, int depth);

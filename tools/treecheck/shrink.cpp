@@ -21,13 +21,20 @@ bool left_is_value(const NODE* t) {
     case STDOT:
     case ARGREF:
     case CALL:
-    case UCALL: return false;
+    case UCALL:
+    case REAL:
+    case IMAG:
+    case VFIELD:
+    case VSCONV:
+    case VRCONV: return false;
+    case VPACK:
+    case MEMCPY:
     case ICALL: return t->left->op != COMMA;
     }
     return !opcode_is_ASG(t->op);
 }
 bool right_is_value(const NODE* t) {
-    return t->op != QUEST && t->op != STDOT && t->op != STREF && t->op != PMCONV && t->op != STASG;
+    return t->op != QUEST && t->op != STDOT && t->op != STREF && t->op != PMCONV && t->op != STASG && t->op != VFIELD;
 }
 
 void list_slots(const NODE* t, bool takes_values, std::vector<SLOT>* slots) {

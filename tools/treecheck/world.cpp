@@ -81,6 +81,9 @@ public:
         w.globals = {object("gi", tp->int_t, 0, SC_EXTERN), object("gl", tp->long_t, 0, SC_STATIC),
                      object("gu", tp->uint_t, 0, SC_EXTDEF), object("gf", tp->float_t, 0, SC_EXTDEF)};
         for (SYMTAB* s : w.globals) (s->type->is_float() ? w.floats : w.integers).push_back(s);
+        w.complexes = {object("z1", tp->mk_complex(tp->float_t)), object("z2", tp->mk_complex(tp->double_t))};
+        w.vectors = {object("w1", tp->mk_vector(tp->int_t, false, 2)), object("w2", tp->mk_vector(tp->int_t, false, 4)),
+                     object("w3", tp->mk_vector(tp->long_t, false, 2))};
         w.volatiles = {object("v1", tp->mk_qual(tp->int_t, QUAL_VOLATILE)),
                        object("v2", tp->mk_qual(tp->ulong_t, QUAL_VOLATILE), 0, SC_EXTERN)};
     }

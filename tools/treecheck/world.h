@@ -13,6 +13,7 @@ constexpr uint32_t MEMORY_UNITS = 256, FIRST_UNIT = 16; // what lies below is no
 
 struct WORLD {
     std::vector<SYMTAB*> integers, floats, pointers, volatiles, globals; // scalars
+    std::vector<SYMTAB*> complexes, vectors; // of float and double; of two and four `int`, two `long`
     std::vector<SYMTAB*> addressed; // scalars that pointers may lead to, apart from the array and the structures
     std::vector<SYMTAB*> objects;   // everything with a place
     SYMTAB *record = nullptr, *other_record = nullptr, *array = nullptr, *record_pointer = nullptr;

@@ -110,7 +110,8 @@ TEST_F(Families, BuiltInFunctions) {
 }
 
 TEST_F(Families, VectorsAndComplexValues) {
-    TYPE* pair = tp->mk_vector(tp->int_t, false, 2);
+    TYPE *pair = tp->mk_vector(tp->int_t, false, 2), *quad = tp->mk_vector(tp->int_t, false, 4),
+         *longs = tp->mk_vector(tp->long_t, false, 2);
     SYMTAB* vs = symbol("v", pair);
     auto lane = [&](int i) { return maketree(VFIELD, name(vs), icon(i), tp->int_t); };
     auto pack = [&](NODE* list) { return maketree(VPACK, list, nullptr, pair); };
@@ -127,6 +128,12 @@ TEST_F(Families, VectorsAndComplexValues) {
         {maketree(VFIELD, pack(args(x(), y())), icon(1), tp->int_t), "y"},
         {maketree(VFIELD, pack(args(f(), y())), icon(1), tp->int_t), "VFIELD(VPACK(f(), y), 1)"},
         {maketree(VFIELD, maketree(VPACKM, x(), nullptr, pair), icon(1), tp->int_t), "x"},
+        {maketree(VPACK, args(x(), y()), nullptr, quad), "VPACK1P(x, y)"},
+        {maketree(VFIELD, maketree(VPACK, args(x(), y()), nullptr, quad), icon(3), tp->int_t), "y"},
+        {maketree(VFIELD, maketree(VPACK1P, x(), y(), quad), icon(0), tp->int_t), "x"},
+        {maketree(VPACK1P, icon(3), icon(3), quad), "VPACKM(3)"},
+        {maketree(VFIELD, maketree(VSCONV, pack(args(x(), y())), nullptr, longs), icon(1), tp->long_t), "(long)y"},
+        {maketree(VSCONV, maketree(VPACKM, x(), nullptr, pair), nullptr, longs), "VPACKM((long)x)"},
         {maketree(REAL, make(), nullptr, tp->float_t), "h"},
         {maketree(IMAG, make(), nullptr, tp->float_t), "g"},
         {maketree(COMPLEX, maketree(REAL, name(cs), nullptr, tp->float_t),

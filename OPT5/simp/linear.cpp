@@ -157,9 +157,9 @@ bool LINEAR::sum_range(RANGE* r) const {
         const WIDE c = coefficient(i);
         WIDE a, b;
         if (__builtin_mul_overflow(c, t.min, &a) || __builtin_mul_overflow(c, t.max, &b)) return false;
+        if (std::min(a, b) < -limit || std::max(a, b) > limit) return false; // their sums stay exact
         r->min += std::min(a, b);
         r->max += std::max(a, b);
-        if (r->min < -limit || r->max > limit) return false;
     }
     return true;
 }

@@ -38,12 +38,12 @@ void allocate_regs(); // the pass, over the current function
 // `statements` are its body, of which the last is the branch.
 INT65 loop_unrolling_factor(const LIST* statements, INT65 count);
 
-// What unrolling asks of the rooms that know loops and accumulators; null until they are there. Without them every
-// addition of a product to a variable counts as an accumulation.
+bool tree_is_OK_for_unrolling(const NODE* stmt);
+
+// What unrolling asks of the room that knows divisions; null until it is there, where none disappears.
 struct UNROLLING_SEAMS {
-    NODE* (*normalize_accumulation)(NODE* stmt) = nullptr; // consumes a copy of the statement, returns its normal form
-    bool (*is_serial_mac)(const NODE* stmt) = nullptr;     // the multiply-accumulate hardware runs it
-    bool (*is_OK_for_unrolling)(const NODE* stmt) = nullptr;
+    bool (*division_disappears)(const NODE* division) =
+        nullptr; // it becomes other operators, which may all be unrolled
 };
 extern UNROLLING_SEAMS unrolling_seams;
 

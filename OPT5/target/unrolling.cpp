@@ -8,7 +8,9 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/opcodes.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/target/accumulators.h"
 #include "OPT5/target/bif.h"
 
 #include <algorithm>
@@ -37,20 +39,36 @@ bool is_call_to_repeat(const NODE* t) {
            std::any_of(std::begin(names), std::end(names), [t](const char* name) { return !strcmp(t->u.name, name); });
 }
 
-bool contains_multiply(const NODE* t) {
-    return tree_contains_matching_node(t, [](const NODE* n) { return n->op == MULT || n->op == SQR; });
+// Whether each operator of a statement may stand in an unrolled loop.
+bool node_is_OK_for_unrolling(const NODE* t) {
+    if (t->type->is_float() && !has_hardware_float()) return false;
+    switch (t->op) {
+    case FCON: return true;
+    case MEMCPY:
+    case CALL:
+    case UCALL: return false;
+    case DIV:
+    case MOD: return unrolling_seams.division_disappears && unrolling_seams.division_disappears(t);
+    case ASM: return tree_is_ASM_comment(t);
+    case ASG:
+        if (t->type->is_vector() && t->left->op != NAME) return false;
+        break;
+    }
+    return op_OK_for_SP[t->op];
 }
 
-// acc += m or acc -= m that the hardware may do in one step.
-bool is_accumulation(const NODE* t) {
-    if (unrolling_seams.is_serial_mac) return unrolling_seams.is_serial_mac(t);
-    return (t->op == PLUSASG || t->op == MINUSASG) && t->left->op == NAME && contains_multiply(t->right);
+} // namespace
+
+bool tree_is_OK_for_unrolling(const NODE* stmt) {
+    return !tree_contains_matching_node(stmt, [](const NODE* t) { return !node_is_OK_for_unrolling(t); });
 }
+
+namespace {
 
 bool leave_to_repeat(const NODE* t) {
-    if (is_accumulation(t) || tree_contains_matching_node(t, is_call_to_repeat)) return true;
+    if (has_a_likely_serial_zelkova_mac(t) || tree_contains_matching_node(t, is_call_to_repeat)) return true;
     if (t->op == ASG && t->left->op == UMULT && t->right->op == UMULT) return true;
-    return unrolling_seams.is_OK_for_unrolling && !unrolling_seams.is_OK_for_unrolling(t);
+    return !tree_is_OK_for_unrolling(t);
 }
 
 // ---- The cost of a statement
@@ -110,8 +128,7 @@ bool costs_one(const NODE* t) { return cost_of(t) == 1; }
 long cost_of_body(const LIST* statements) {
     long cost = 0;
     for (; statements && statements->rest; statements = statements->rest) {
-        NODE* t = copy_tree(statements->first);
-        if (unrolling_seams.normalize_accumulation) t = unrolling_seams.normalize_accumulation(t);
+        NODE* t = normalize_zelkova_accumulation(copy_tree(statements->first));
         const bool stays = leave_to_repeat(t);
         const long own = stays || tree_is_ASM_comment(t) ? 0 : cost_of(t);
         cost = own == NO_COST ? NO_COST : cost + own;

@@ -2,6 +2,7 @@
 
 #include "../ir/tree_builder.h"
 
+#include "OPT5/target/accumulators.h"
 #include "OPT5/target/target.h"
 
 #include <map>
@@ -122,24 +123,68 @@ TEST_F(Unrolling, BodiesForTheRepeatInstruction) {
 }
 
 TEST_F(Unrolling, LoopsThatStayAsTheyAre) {
-    auto product = [] { return bin(MULT, x(), i()); };
+    auto product = [] { return un(SCONV, bin(MULT, deref(p()), i()), tp->long_t); }; // for the accumulator l
+    auto sum = [&] { return bin(PLUS, l(), product(), tp->long_t); };
     auto call_of = [](int op, const char* f) {
         return maketree(COMMAOP, op == ICALL ? mk_ICALL(f, i(), tp->int_t) : mk_MCALL(f, i(), tp->int_t), icon(0),
                         tp->int_t);
     };
     for (bool repeats : {false, true}) {
         rtc_RPT_ok_for_loop = repeats;
-        EXPECT_EQ(factor({bin(PLUSASG, x(), product(), tp->int_t)}, 2), 1);
+        EXPECT_EQ(factor({bin(PLUSASG, l(), product(), tp->long_t)}, 2), 1);
+        EXPECT_EQ(factor({asg(l(), sum())}, 2), 1);
         EXPECT_EQ(factor({asg(deref(p()), deref(q()))}, 2), 1);
         EXPECT_EQ(factor({call_of(MCALL, "__dmac")}, 16), 1);
         EXPECT_EQ(factor({call_of(ICALL, "__IQmpy")}, 16), 1);
     }
-    EXPECT_GT(factor({call_of(ICALL, "__dmac")}, 16), 1); // not of this kind
-    unrolling_seams.is_OK_for_unrolling = [](const NODE*) { return false; };
-    EXPECT_EQ(factor(cheap(), 3), 1);
-    unrolling_seams = {};
-    unrolling_seams.is_serial_mac = [](const NODE*) { return false; };
+    EXPECT_GT(factor({call_of(ICALL, "__dmac")}, 16), 1);                           // not of this kind
+    EXPECT_EQ(factor({bin(PLUSASG, x(), bin(MULT, x(), i()), tp->int_t)}, 16), 8); // no accumulator
     EXPECT_EQ(factor({bin(PLUSASG, x(), i(), tp->int_t)}, 3), 3);
+    auto quotient = [] { return std::vector<NODE*>{asg(x(), bin(DIV, x(), icon(3)))}; };
+    EXPECT_EQ(factor(quotient(), 3), 1);
+    unrolling_seams.division_disappears = [](const NODE*) { return true; };
+    EXPECT_EQ(factor(quotient(), 3), 3);
+}
+
+TEST_F(Unrolling, ProductsForTheAccumulator) {
+    auto longs = [] { return deref(variable("lp", tp->mk_ptr(tp->long_t))); };
+    auto quad = [](NODE* t) { return un(SCONV, t, tp->llong_t); };
+    auto wide = [](NODE* t) { return un(SCONV, t, tp->long_t); };
+    auto halves = [&] { return bin(MULT, wide(deref(p())), wide(i()), tp->long_t); };
+    auto product = [&] { return bin(MULT, quad(longs()), quad(l()), tp->llong_t); };
+    auto right = [](NODE* t, int n) { return bin(SRL, t, icon(n), t->type); };
+    const struct {
+        NODE* tree;
+        bool plain, stripped; // without and with a product mode
+    } rows[] = {
+        {halves(), true, true},
+        {right(halves(), 2), false, true},
+        {right(halves(), 7), false, false},
+        {bin(SLL, halves(), icon(1), tp->long_t), false, true},
+        {bin(MULT, wide(x()), wide(i()), tp->long_t), false, false}, // nothing from memory
+        {wide(bin(MULT, deref(p()), i(), tp->int_t)), true, true},
+        {product(), true, true},
+        {right(product(), 34), true, true}, // the high half, with or without a mode
+        {right(product(), 39), true, true},
+        {wide(product()), true, true},
+        {bin(PLUS, l(), l(), tp->long_t), false, false},
+    };
+    for (const auto& row : rows) {
+        EXPECT_EQ(is_a_likely_mpy_for_zelkova_mac(row.tree, false), row.plain) << tree_to_infix(row.tree);
+        EXPECT_EQ(is_a_likely_mpy_for_zelkova_mac(row.tree, true), row.stripped) << tree_to_infix(row.tree);
+    }
+    auto normal = [](NODE* t) {
+        t = normalize_zelkova_accumulation(t);
+        const std::string text = show(t);
+        erase_tree(t);
+        return text;
+    };
+    EXPECT_EQ(normal(asg(l(), bin(PLUS, halves(), l(), tp->long_t))), "l += (long)*p * (long)i");
+    EXPECT_EQ(normal(asg(l(), bin(MINUS, l(), halves(), tp->long_t))), "l -= (long)*p * (long)i");
+    EXPECT_EQ(normal(asg(l(), bin(MINUS, halves(), l(), tp->long_t))), "l = (long)*p * (long)i - l");
+    EXPECT_EQ(normal(asg(x(), bin(PLUS, x(), i()))), "x = x + i");
+    NODE* uses_itself = bin(PLUSASG, l(), bin(PLUS, halves(), l(), tp->long_t), tp->long_t);
+    EXPECT_FALSE(has_a_likely_serial_zelkova_mac(uses_itself));
 }
 
 } // namespace

@@ -533,12 +533,6 @@ void MERGE::remove_counter(const INDUCTION& i) {
 
 // ---- The first test
 
-bool is_promised(const BBLK* bb) {
-    for (const LIST* s = bb->statements; s; s = s->rest)
-        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
-    return false;
-}
-
 // A test on top that is known to stay in the loop at first is passed by: the loop is entered behind it, and the test
 // stands at its end.
 void MERGE::skip_first_test() {
@@ -549,7 +543,7 @@ void MERGE::skip_first_test() {
         const NODE* targets = test.branch->right;
         BBLK* stay = (test.stays_if_true ? targets->left : targets->right)->lbl->bblock;
         BBLK* before = loops.block_ahead(loop);
-        if (!before || is_promised(before) || stay == loop->header) return;
+        if (!before || ends_in_promise(before) || stay == loop->header) return;
         disconnect(before, loop->header);
         subst_bb_for_bb_in_bb(stay, loop->header, before);
         connect(before, stay);

@@ -4,6 +4,7 @@
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/seq.h"
 
 #include <algorithm>
@@ -128,18 +129,6 @@ bool NATURAL_LOOPS::contains(const NATURAL_LOOP* loop, const BBLK* bb) const {
 }
 
 // ---- The place ahead
-
-namespace {
-
-// What a pragma promises is promised of the loop that follows in the text; the mark of the loop's place promises
-// nothing, but stands with the others.
-bool ends_in_promise(const BBLK* bb) {
-    for (const LIST* s = bb->statements; s; s = s->rest)
-        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
-    return false;
-}
-
-} // namespace
 
 BBLK* NATURAL_LOOPS::block_ahead(NATURAL_LOOP* loop) {
     std::vector<BBLK*> outside;

@@ -7,6 +7,7 @@
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
+#include <unordered_set>
 #include <vector>
 
 namespace {
@@ -40,7 +41,7 @@ public:
         B = start_of_stretch();
         if (!B || B == currfuninfo->bb_list) return false;
         A = B->rdflink;
-        return A != nullptr && B->dfn <= C->dfn;
+        return A != nullptr && B->dfn <= C->dfn && (!ends_in_promise(A) || is_in_loop(D));
     }
 
     void apply() {
@@ -76,6 +77,20 @@ private:
         return highest;
     }
 
+    // Whether a way leads from `bb` back to B by way of E.
+    bool is_in_loop(const BBLK* bb) const {
+        std::unordered_set<const BBLK*> seen{B, E};
+        std::vector<const BBLK*> work{E};
+        while (!work.empty()) {
+            const BBLK* at = work.back();
+            work.pop_back();
+            if (at == bb) return true;
+            for (const EDGE* e = at->predecessors; e; e = e->rest)
+                if (seen.insert(e->first).second) work.push_back(e->first);
+        }
+        return false;
+    }
+
     // The block whose way leads to F, the loop's test on top; without a next block, the nearest one before E that
     // control does not fall out of.
     BBLK* end_of_stretch() const {
@@ -102,14 +117,6 @@ private:
 
     BBLK *A = nullptr, *B = nullptr, *C = nullptr, *D = nullptr, *E, *F = nullptr;
 };
-
-// What a pragma promises is promised of the loop that follows in the text, by its label: what stands behind one stays
-// there, and that label stays in use. The mark of the loop's place in the source promises nothing.
-bool ends_in_promise(const BBLK* bb) {
-    for (const LIST* s = bb->statements; s; s = s->rest)
-        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
-    return false;
-}
 
 // ---- A loop whose test still stands on top
 
@@ -212,6 +219,14 @@ void put_exits_behind_tests() {
 
 } // namespace
 
+// What a pragma promises is promised of the loop that follows in the text, by its label: what stands behind one stays
+// there, and that label stays in use. The mark of the loop's place in the source promises nothing.
+bool ends_in_promise(const BBLK* bb) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
+    return false;
+}
+
 void rotate_loops() {
     if (!currfuninfo->bb_list) return;
     renumber_bblocks();
@@ -229,6 +244,7 @@ void rotate_loops() {
     if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
         close_loops_by_tests();
         put_bodies_before_tests();
+        skip_decided_entry_tests();
         put_exits_behind_tests();
         renumber_bblocks();
     }

@@ -1,0 +1,128 @@
+// The first test of a loop, decided by the constants that its counters start from.
+//
+//     i = 0; goto test; body: ... test: if (i < 24) goto body;     loses the jump: the loop is entered at its body
+//     i = 0; if (i >= 24) goto behind; body: ...                   loses the test
+//
+// Earlier in the pipeline this would leave loops with two entries, or a body behind no test at all; here only the
+// layout is left to do. A promise of iterations is about the loop whose label follows in the text, so behind one only
+// what is next in the text may be entered.
+
+#include "OPT5/scalar/simpcfg.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/simp.h"
+
+#include <vector>
+
+namespace {
+
+constexpr int MAX_TEST_NODES = 12;
+constexpr size_t MAX_TAIL = 12; // statements looked at for constants
+
+// The IF that is all of a block, or null.
+NODE* lone_test(const BBLK* bb) {
+    const LIST* only = bb->statements;
+    if (!only || only->rest || only->first->op != IF || bb->is_in_LIR_form()) return nullptr;
+    NODE* test = only->first;
+    if (test->left->op == ENDLOOP || tree_has_side_effects(test->left)) return nullptr;
+    return count_nodes_in_tree(test->left) <= MAX_TEST_NODES ? test : nullptr;
+}
+
+class ENTRY_TESTS {
+public:
+    bool run() {
+        bool changed = false;
+        for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
+            if (NODE* test = lone_test(bb)) changed |= skip(bb, test);
+        return changed;
+    }
+
+private:
+    bool skip(BBLK* bb, NODE* test) {
+        std::vector<BBLK*> from;
+        for (const EDGE* e = bb->predecessors; e; e = e->rest)
+            if (e->first->dfn < bb->dfn && e->first->branch() && e->first->branch()->op == BRANCH)
+                from.push_back(e->first);
+        bool changed = false;
+        for (BBLK* before : from) {
+            BBLK* target = decided_target(before, test);
+            if (!target || target == bb) continue;
+            if (ends_in_promise(before) && target != before->dflink) continue;
+            const bool is_only_way = !bb->predecessors->rest;
+            if (is_only_way && !decide(bb, target)) continue;
+            if (!is_only_way) redirect(before, bb, target);
+            changed = true;
+            if (is_only_way) break;
+        }
+        return changed;
+    }
+
+    // Where the test leads behind what `before` assigns last; null if that is not known.
+    BBLK* decided_target(const BBLK* before, const NODE* test) {
+        std::vector<const NODE*> tail;
+        for (const LIST* s = before->statements; s; s = s->rest) tail.push_back(s->first);
+        NODE* condition = copy_tree(test->left);
+        for (size_t n = 0; n < tail.size() && n < MAX_TAIL && condition->op != ICON; ++n) {
+            const NODE* t = tail[tail.size() - 1 - n];
+            if (t->op == BRANCH || t->op == PPRAGMA || !names_a_variable_of(condition, t)) continue;
+            if (!gives_constant(t)) break;
+            condition = simp_tree(with_value(condition, t->left->u.sym, t->right), nullptr);
+        }
+        const NODE* ways = test->right;
+        BBLK* target = nullptr;
+        if (condition->op == ICON) target = (condition->u.lval.is_zero() ? ways->right : ways->left)->lbl->bblock;
+        erase_tree(condition);
+        return target;
+    }
+
+    // Of another statement that names a variable of the condition it is not known what it makes of that; one that names
+    // none leaves those alone that are reached by their NAMEs only.
+    static bool names_a_variable_of(NODE* condition, const NODE* t) {
+        bool names = tree_contains_op(t, ASM) || tree_is_arg_prolog(t);
+        for_each_node(condition, [&](const NODE* n) { names |= n->op == NAME && sym_appears_in_tree(n->u.sym, t); });
+        return names;
+    }
+
+    bool gives_constant(const NODE* t) {
+        if (t->op != ASG || t->left->op != NAME || tree_is_arg_prolog(t)) return false;
+        if (t->right->op != ICON && !(t->right->type->is_pointer() && pointer_is_an_adcon(t->right))) return false;
+        if (!has_marks) init_alias_marks();
+        has_marks = true;
+        const SYMTAB* sym = t->left->u.sym;
+        return !t->left->type->is_volatile() && sym->type->is_scalar() && only_its_name_reaches(sym);
+    }
+
+    static NODE* with_value(NODE* tree, const SYMTAB* sym, const NODE* value) {
+        return rewrite_tree(tree, [=](NODE* n) {
+            if (n->op != NAME || n->u.sym != sym) return n;
+            NODE* known = coerce_to_type(n->type->stqs(), copy_tree(value));
+            erase_tree(n);
+            return known;
+        });
+    }
+
+    // The block has the one way in. Its other way out must not have been the only one to that block.
+    static bool decide(BBLK* bb, BBLK* target) {
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (e->first != target && !e->first->predecessors->rest) return false;
+        make_branch(bb, bb->last_statement(), target);
+        return true;
+    }
+
+    static void redirect(BBLK* before, BBLK* bb, BBLK* target) {
+        subst_bb_for_bb_in_bb(target, bb, before);
+        disconnect(before, bb);
+        connect(before, target);
+    }
+
+    bool has_marks = false;
+};
+
+} // namespace
+
+bool skip_decided_entry_tests() { return ENTRY_TESTS().run(); }

@@ -1,0 +1,67 @@
+// A loop whose counter starts from a constant is entered behind its first test.
+// RUN: --opt_level=2
+#include <zrun.h>
+
+int g[40], n = 3;
+int *at = &n;
+
+// FUNCTION: counted
+// HAS: i = 0
+// NOT: goto
+// HAS: /^L\d+:/
+// HAS: /^if \(!\(i >= 24\)\) goto L\d+$/
+// COUNT 1: goto
+void counted(void) {
+    for (int i = 0; i < 24; i++) g[i & 7] += i * i;
+}
+
+// What the loop starts from is not known here: a call, an assembly text or a pointer may have changed it.
+// FUNCTION: unknown
+// HAS: /^goto L\d+$/
+// HAS: /_n >= 5/
+void unknown(void) {
+    n = 0;
+    *at += 5;
+    for (; n < 5; n++) g[n]++;
+}
+
+// FUNCTION: stepped
+// COUNT 1: s >= 4
+int stepped(int s) {
+    s = 4;
+    g[s++]++;
+    while (s < 4) g[s++]++;
+    return s;
+}
+
+// The label behind a promise is of its own loop, wherever other loops lie.
+// FUNCTION: promised
+// HAS: /MUST_ITERATE/
+// HAS: /^L\d+:/
+// HAS: /w == 3/
+// COUNT 1: MUST_ITERATE
+long promised(int k, int *p) {
+    int w, j;
+    long s = 0;
+    _Pragma("MUST_ITERATE(1, 1)")
+    for (w = 2; w != 3; w++) {
+        p[w & 7] = g[w];
+        n += p[k & 7];
+    }
+    ++g[1];
+    if (n != k) {
+        for (j = -6; j >= -7; j -= 1) s -= (long)g[j + 7] * g[j + 37];
+        n = (int)s;
+    }
+    return s;
+}
+
+int main(void) {
+    int p[8] = {0};
+    counted();
+    unknown();
+    put_i16(stepped(1));
+    put_i32(promised(4, p));
+    put_i16(g[3] + g[4] + n);
+    return 0;
+}

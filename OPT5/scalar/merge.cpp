@@ -595,8 +595,8 @@ void merge_symbols() {
     if (function_saves_environment()) return;
     renumber_bblocks();
     NATURAL_LOOPS loops;
-    if (loops.inner_first().empty()) return;
     find_live_variables(0, false);
+    if (currfuninfo->lva_sym_count) eliminate_single_use_temps();
     for (const auto& loop : loops.inner_first())
         if (loop->inside < DEEPEST) MERGE(loops, loop.get()).run();
     lva_cleanup();

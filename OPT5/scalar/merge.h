@@ -10,6 +10,9 @@ void merge_symbols();
 // A variable of the current function that is like `sym`, the n-th of it; with what is known of a pointer.
 SYMTAB* clone_symbol(SYMTAB* sym, int n);
 
+// Computes the value of a variable that is set once and read once where it is read. The bits of the candidates stand.
+void eliminate_single_use_temps();
+
 // The pointers of the current function that a use of them has an offset to.
 void init_skewed_offset_syms();
 bool is_skewed_offset_sym(const SYMTAB* sym);

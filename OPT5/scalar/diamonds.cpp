@@ -6,6 +6,7 @@
 
 #include "OPT5/scalar/simpcfg.h"
 
+#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -20,9 +21,9 @@ namespace {
 constexpr int MAX_ARM_NODES = 8; // both arms are computed: they have to be cheap
 
 // An access through a pointer, a division and a call are only safe, or only worth it, where the condition holds.
-bool rhs_may_need_guard_in_lhs(NODE* rhs) {
+bool rhs_may_need_guard_in_lhs(const NODE* rhs) {
     bool guard = false;
-    for_each_node(rhs, [&](const NODE* t) {
+    for_each_subtree(rhs, [&](const NODE* t) {
         switch (t->op) {
         case UMULT:
         case STREF:
@@ -41,7 +42,7 @@ bool rhs_may_need_guard_in_lhs(NODE* rhs) {
     return guard;
 }
 
-bool is_plain_arm(NODE* value) {
+bool is_plain_arm(const NODE* value) {
     return count_nodes_in_tree(value) <= MAX_ARM_NODES && !tree_has_side_effects(value) &&
            !rhs_may_need_guard_in_lhs(value);
 }
@@ -79,9 +80,13 @@ BBLK* arm_of(const NODE* ref, const BBLK* bb) {
 NODE* sole_assignment(const BBLK* arm) {
     const LIST* s = arm->statements;
     if (!s || !s->rest || s->rest->rest || s->first->op != ASG || s->rest->first->op != BRANCH) return nullptr;
-    if (tree_is_arg_prolog(s->first) || !is_plain_target(s->first->left) || !is_plain_arm(s->first->right))
-        return nullptr;
-    return s->first;
+    return tree_is_arg_prolog(s->first) || !is_plain_target(s->first->left) ? nullptr : s->first;
+}
+
+// One whose value may be computed where the block is not reached.
+NODE* sole_plain_assignment(const BBLK* arm) {
+    NODE* asg = sole_assignment(arm);
+    return asg && is_plain_arm(asg->right) ? asg : nullptr;
 }
 
 NODE* sole_return(const BBLK* arm) {
@@ -111,7 +116,7 @@ void replace_test(BBLK* bb, LIST* test, NODE* statement, BBLK* join) {
 }
 
 bool join_assignments(BBLK* bb, LIST* test, BBLK* on_true, BBLK* on_false) {
-    NODE *a = sole_assignment(on_true), *b = sole_assignment(on_false);
+    NODE *a = sole_plain_assignment(on_true), *b = sole_plain_assignment(on_false);
     BBLK* join = sole_successor(on_true);
     if (!a || !b || !join || join != sole_successor(on_false) || join == on_true || join == on_false) return false;
     if (!trees_are_congruent(a->left, b->left, false)) return false;
@@ -134,7 +139,17 @@ bool join_returns(BBLK* bb, LIST* test, BBLK* on_true, BBLK* on_false) {
     return true;
 }
 
-// `if (a < x) x = a;`: one arm is empty, which pays where the target has the instruction.
+// `x < 0 ? -x : x`, or null.
+NODE* make_absolute_value(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
+    if ((a->op != UMINUS && b->op != UMINUS) || !is_plain_arm(a) || !is_plain_arm(b)) return nullptr;
+    NODE* value = make_select(c, a, b, type);
+    if (value->op == ABS) return value;
+    erase_tree(value);
+    return nullptr;
+}
+
+// `if (a < x) x = a;` and `if (x < 0) x = -x;`: one arm is empty, which pays where the target has the instruction. The
+// condition computes what an extremum chooses from.
 bool join_extremum(BBLK* bb, LIST* test, BBLK* arm, BBLK* join, bool holds) {
     if (!arm || arm == join || sole_successor(arm) != join) return false;
     NODE* asg = sole_assignment(arm);
@@ -142,7 +157,9 @@ bool join_extremum(BBLK* bb, LIST* test, BBLK* arm, BBLK* join, bool holds) {
     NODE* condition = test->first->left;
     if (tree_has_side_effects(condition)) return false;
     const NODE *a = asg->right, *b = asg->left;
-    NODE* value = make_minmax(condition, holds ? a : b, holds ? b : a, asg->left->type);
+    if (!holds) std::swap(a, b);
+    NODE* value = make_minmax(condition, a, b, asg->left->type);
+    if (!value) value = make_absolute_value(condition, a, b, asg->left->type);
     if (!value) return false;
     NODE* statement = mk_ASG(copy_tree(asg->left), value);
     drop_arm(bb, arm);
@@ -164,9 +181,7 @@ bool join_diamond(BBLK* bb) {
 
 } // namespace
 
-bool may_be_arm_of_select(const NODE* t) {
-    return t->op == ASG && is_plain_target(t->left) && is_plain_arm(t->right);
-}
+bool may_be_arm_of_select(const NODE* t) { return t->op == ASG && is_plain_target(t->left) && is_plain_arm(t->right); }
 
 bool join_diamonds() {
     if (opt_level() == 0) return false;

@@ -51,6 +51,23 @@ int32_t largest(const int32_t *p, int n) {
     return m;
 }
 
+// What the condition reads may be chosen from; what only the arm reads needs its guard.
+// FUNCTION: peaks
+// COUNT 1: /= __max\(m, \*/
+// COUNT 1: /< 0.*goto/
+// COUNT 1: | 
+int peaks(const int *p, int n) {
+    int m = -9, e, sum = 0;
+    while (n-- > 0) {
+        if (*p > m) m = *p;
+        e = *p++ - 6;
+        if (e < 0) e = -e;
+        sum += e;
+    }
+    if (n < 0) m = table[sum & 3];
+    return m + sum;
+}
+
 // FUNCTION: bounded
 // COUNT 0: if (
 // HAS: /__min\(.*7/
@@ -111,6 +128,7 @@ void volatile_target(int x) {
 }
 
 int main(void) {
+    put_i16(peaks(table, 4));
     volatile float zero = 0.0F;
     static const int32_t list[5] = {-70000, 5, 90000, -3, 89999};
     put_i16(selected(4, 10) + selected(3, 10));

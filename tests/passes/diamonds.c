@@ -55,7 +55,7 @@ int32_t largest(const int32_t *p, int n) {
 // FUNCTION: peaks
 // COUNT 1: /= __max\(m, \*/
 // COUNT 1: /< 0.*goto/
-// COUNT 1: | 
+// COUNT 1: = ABS(e)
 int peaks(const int *p, int n) {
     int m = -9, e, sum = 0;
     while (n-- > 0) {

@@ -109,6 +109,19 @@ const NODE* object_of(const NODE* t) {
         }
 }
 
+// `completes`: nothing leaves the statement in its middle, as an exception may in front of its dispatch.
+template <class F>
+void for_each_statement_backward(BBLK* bb, const F& visit) {
+    std::vector<LIST*> cells;
+    for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
+    bool completes = true;
+    for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
+        const bool is_dispatch = tree_is_EH_SWITCH((*it)->first);
+        visit((*it)->first, completes);
+        completes = !is_dispatch;
+    }
+}
+
 class OBJECT_LIVES {
 public:
     OBJECT_LIVES() {
@@ -134,7 +147,7 @@ public:
         return bit >= 0 && !live.test(static_cast<uint32_t>(bit)) && !tree_has_side_effects(lvalue);
     }
 
-    // From behind a statement to in front of it. `completes`: nothing leaves it in its middle.
+    // From behind a statement to in front of it.
     void pass(NODE* t, BITVEC& live, bool completes) const {
         const NODE* target = nullptr;
         if (is_plain_assignment(t) && bit_of_target(t->left) >= 0) {
@@ -197,19 +210,6 @@ private:
 
     std::unordered_map<const SYMTAB*, uint32_t> bit_of; // looked up, never walked
     std::vector<BITVEC> at_entry;                       // by depth-first number
-
-public:
-    template <class F>
-    static void for_each_statement_backward(BBLK* bb, const F& visit) {
-        std::vector<LIST*> cells;
-        for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
-        bool completes = true;
-        for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
-            const bool is_dispatch = tree_is_EH_SWITCH((*it)->first);
-            visit((*it)->first, completes);
-            completes = !is_dispatch; // the statement in front of a dispatch may be left in its middle
-        }
-    }
 };
 
 // ---- Dead stores
@@ -219,27 +219,9 @@ public:
     void run(BBLK* bb) {
         live = objects.at_exit(bb);
         bool dropped = false;
-        OBJECT_LIVES::for_each_statement_backward(bb, [&](NODE*& t, bool completes) {
-            bool is_cover = false;
-            SUBRANGE target;
-            if (is_plain_assignment(t) || is_operator_assignment(t)) {
-                const bool is_known = !tree_is_arg_prolog(t) && compute_subrange(t->left, &target);
-                if (objects.is_dead_target(t->left, live) || (is_known && is_covered(target)))
-                    remove(t);
-                else
-                    is_cover = is_known && completes && is_plain_assignment(t);
-            }
-            if (!t) {
-                dropped = true;
-                return;
-            }
-            if (!objects.empty()) objects.pass(t, live, completes);
-            if (is_cover) {
-                if (overwritten.size() == MOST_COVERS) overwritten.erase(overwritten.begin());
-                overwritten.push_back(target);
-            }
-            // What the store itself takes counts as read in front of it.
-            kill_aliased_subranges(t, is_cover);
+        for_each_statement_backward(bb, [&](NODE*& t, bool completes) {
+            statement(t, completes);
+            dropped |= !t;
         });
         overwritten.clear();
         if (dropped) drop_empty_cells(&bb->statements);
@@ -247,6 +229,23 @@ public:
 
 private:
     static constexpr size_t MOST_COVERS = 32;
+
+    void statement(NODE*& t, bool completes) {
+        const bool assigns = is_plain_assignment(t) || is_operator_assignment(t);
+        SUBRANGE target;
+        const bool is_known = assigns && !tree_is_arg_prolog(t) && compute_subrange(t->left, &target);
+        const bool is_dead = assigns && (objects.is_dead_target(t->left, live) || (is_known && is_covered(target)));
+        const bool is_cover = !is_dead && is_known && completes && is_plain_assignment(t);
+        if (is_dead) remove(t);
+        if (!t) return;
+        if (!objects.empty()) objects.pass(t, live, completes);
+        if (is_cover) {
+            if (overwritten.size() == MOST_COVERS) overwritten.erase(overwritten.begin());
+            overwritten.push_back(target);
+        }
+        // What the store itself takes counts as read in front of it.
+        kill_aliased_subranges(t, is_cover);
+    }
 
     bool is_covered(const SUBRANGE& s) const {
         return std::any_of(overwritten.begin(), overwritten.end(), [&s](const SUBRANGE& o) { return covers(o, s); });

@@ -88,8 +88,6 @@ void NATURAL_LOOPS::nest() {
             outer = loop;
         }
     }
-    for (auto it = loops.rbegin(); it != loops.rend(); ++it)
-        if ((*it)->parent) (*it)->depth = (*it)->parent->depth + 1;
 }
 
 // An edge back to a block that the walk is still in, but which does not dominate its source, closes a cycle with

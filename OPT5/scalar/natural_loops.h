@@ -17,7 +17,6 @@ struct NATURAL_LOOP {
     std::vector<BBLK*> blocks; // the header first; those of inner loops too
     std::vector<BBLK*> latches;
     NATURAL_LOOP* parent = nullptr;
-    int depth = 1;            // 1 of an outermost loop
     int inside = 0;           // levels of loops in it
     bool is_reducible = true; // no cycle in it but through headers
 };

@@ -70,6 +70,42 @@ NODE* mask_under_or(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
+// The terms of a chain of ors: one is masked by a constant, the others lie inside of `c` or are constants.
+bool one_term_is_masked(const NODE* t, uint64_t c, int* masked, int* terms) {
+    if (is_node(t, ORB)) {
+        return one_term_is_masked(t->left, c, masked, terms) && one_term_is_masked(t->right, c, masked, terms);
+    }
+    constexpr int MOST_TERMS = 8;
+    if (++*terms > MOST_TERMS) return false;
+    if (is_icon(t) || ((known_bits(t).zeros | c) & mask_of(t->type)) == mask_of(t->type)) return true;
+    return is_node_with_icon(t, ANDB) && ++*masked == 1;
+}
+
+NODE* masked_terms(NODE* t, uint64_t c, struct LOOP* loop) {
+    if (is_node(t, ORB)) {
+        t->left = masked_terms(t->left, c, loop);
+        t->right = masked_terms(t->right, c, loop);
+        return simp_node(t, loop);
+    }
+    if (is_icon(t)) {
+        set_icon(t, t->u.lval & INT65(0, c));
+        return t;
+    }
+    if (((known_bits(t).zeros | c) & mask_of(t->type)) == mask_of(t->type)) return t;
+    set_icon(t->right, t->right->u.lval & INT65(0, c));
+    return simp_node(t, loop);
+}
+
+// ((x & c1) | y) & c2 with y inside of c2: the mask joins the one below. So fields of a word are set in turn.
+NODE* mask_into_or(NODE* t, struct LOOP* loop) {
+    if (t->op != ANDB || !is_icon(t->right) || !is_node(t->left, ORB) || !operands_have_type(t->left)) return nullptr;
+    const uint64_t c = bits_of(t->right);
+    int masked = 0, terms = 0;
+    if (!one_term_is_masked(t->left, c, &masked, &terms) || masked != 1) return nullptr;
+    erase_node(t->right);
+    return masked_terms(take_left(t), c, loop);
+}
+
 // ---- Operands that meet
 bool is_complement_of(const NODE* a, const NODE* b) { return is_unary(a, NOTB) && same_value(a->left, b); }
 
@@ -234,6 +270,7 @@ NODE* invert_compare(NODE* t, struct LOOP* loop) {
 const RULE bit_rules[] = {trivial_constant,
                           join_constants,
                           constant_of_right_operand_outward,
+                          mask_into_or,
                           constant_against_known_bits,
                           mask_under_or,
                           meet_itself,

@@ -11,10 +11,12 @@ namespace {
 
 constexpr int MOST_LEVELS = 6;
 
-bool is_integer(const TYPE* t) { return (t->is_int() || t->is_enum()) && t->size >= 1 && t->size <= 64; }
+// `wchar_t` is neither signed nor unsigned to the type package: nothing is known of it.
+bool is_integer(const TYPE* t) {
+    return (t->is_int() || t->is_enum()) && !t->is_wchar() && t->size >= 1 && t->size <= 64;
+}
 uint64_t mask_of(const TYPE* t) { return t->size >= 64 ? ~uint64_t(0) : (uint64_t(1) << t->size) - 1; }
 uint64_t sign_bit(const TYPE* t) { return uint64_t(1) << (t->size - 1); }
-// `wchar_t` is neither signed nor unsigned to the type package; its values wrap signed.
 bool is_signed(const TYPE* t) { return !t->is_bool() && !t->is_unsigned(); }
 
 KNOWN_BITS known(const NODE* t, int levels);

@@ -27,7 +27,7 @@ inline RANGE both(const RANGE& a, const RANGE& b) {
 WIDE to_wide(INT65 v);
 INT65 to_int65(WIDE v); // of a value in its range
 
-bool has_value_range(const TYPE* t); // an integer or enumeration of 1 to 64 bits
+bool has_value_range(const TYPE* t); // an integer or enumeration of 1 to 64 bits; `wchar_t` has no known sign
 bool wraps_signed(const TYPE* t);    // of such a type
 // The values that a variable of the type can have. An enumeration may hold values of either sign.
 RANGE range_of_type(const TYPE* t);

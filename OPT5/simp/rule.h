@@ -15,7 +15,8 @@ struct LOOP;
 namespace rules {
 
 // ---- Types. Rules of integer algebra hold in two's complement at the operator's width, for operands of its own type.
-inline bool is_integer(const TYPE* t) { return t->is_int() && !t->is_bool() && t->size <= 64; }
+// `wchar_t` has no sign of its own, and no rule.
+inline bool is_integer(const TYPE* t) { return t->is_int() && !t->is_bool() && !t->is_wchar() && t->size <= 64; }
 inline bool same_integers(const TYPE* a, const TYPE* b) {
     return is_integer(a) && is_integer(b) && a->size == b->size && a->is_unsigned() == b->is_unsigned();
 }

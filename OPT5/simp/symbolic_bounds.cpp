@@ -18,7 +18,9 @@ WIDE to_wide(INT65 v) {
 }
 INT65 to_int65(WIDE v) { return INT65(static_cast<int32_t>(v >> 64), static_cast<uint64_t>(v)); }
 
-bool has_value_range(const TYPE* t) { return (t->is_int() || t->is_enum()) && t->size >= 1 && t->size <= 64; }
+bool has_value_range(const TYPE* t) {
+    return (t->is_int() || t->is_enum()) && !t->is_wchar() && t->size >= 1 && t->size <= 64;
+}
 bool wraps_signed(const TYPE* t) { return !t->is_bool() && !t->is_unsigned(); }
 
 RANGE range_of_type(const TYPE* t) {

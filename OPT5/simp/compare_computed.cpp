@@ -37,7 +37,7 @@ struct PREIMAGE {
 };
 
 PREIMAGE of_quotient(WIDE c, WIDE d) { return {c > 0 ? c * d : (c - 1) * d + 1, c < 0 ? c * d : (c + 1) * d - 1}; }
-PREIMAGE of_shift(WIDE c, int n) { return {c << n, ((c + 1) << n) - 1}; }
+PREIMAGE of_shift(WIDE c, int n) { return {c * (WIDE(1) << n), (c + 1) * (WIDE(1) << n) - 1}; }
 
 NODE* compare_quotient(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;

@@ -184,7 +184,7 @@ void MERGE::split_by_offsets() {
             const int64_t low = part.uses.empty() ? use.address.offset : part.uses.front().address.offset;
             if (!offset_is_in_range(INT65(use.address.offset - low), (*use.place)->type, 1)) {
                 if (print_debug) {
-                    debug_printf("\tSplitting SRIV %s ==> %s\n", tree_to_infix(*part.uses.front().place).c_str(),
+                    debug_printf("\n\tSplitting SRIV %s ==> %s\n", tree_to_infix(*part.uses.front().place).c_str(),
                                  tree_to_infix(*use.place).c_str());
                     debug_printf("\t  New SRIV gets use %s\n", stmt2infix(use.statement).c_str());
                     debug_printf("\t  Old SRIV gets use %s\n", stmt2infix(part.uses.front().statement).c_str());

@@ -395,23 +395,21 @@ bool pointer_contains_adcon_term(const NODE* t) {
     }
 }
 
-SYMTAB* object_name_if_known(const NODE* t) {
+SYMTAB* pointee_name_if_known(const NODE* p) {
     for (;;) {
-        while (t && (is_transparent(t->op) || t->op == STDOT || (t->op >= SSA_USE && t->op <= SSA_CHI))) t = t->left;
-        if (!t) return nullptr;
-        if (t->op == NAME) return t->u.sym;
-        if (t->op != STREF && (t->op != UMULT || t->right)) return nullptr;
-        // Through the address: a pointer into an object stays in it, whatever is added.
-        const NODE* p = t->left;
-        for (;;) {
-            while (is_transparent(p->op) || ((p->op == PCONV || p->op == ISP2CHAR) && p->left->type->is_pointer()))
-                p = p->left;
-            if (p->op != PLUS && p->op != MINUS) break;
-            p = p->op == PLUS && !p->left->type->is_pointer() ? p->right : p->left;
-        }
-        if (p->op != UAND) return nullptr;
-        t = p->left;
+        while (is_transparent(p->op) || ((p->op == PCONV || p->op == ISP2CHAR) && p->left->type->is_pointer()))
+            p = p->left;
+        if (p->op != PLUS && p->op != MINUS) break;
+        p = p->op == PLUS && !p->left->type->is_pointer() ? p->right : p->left;
     }
+    return p->op == UAND ? object_name_if_known(p->left) : nullptr;
+}
+
+SYMTAB* object_name_if_known(const NODE* t) {
+    while (t && (is_transparent(t->op) || t->op == STDOT || (t->op >= SSA_USE && t->op <= SSA_CHI))) t = t->left;
+    if (!t) return nullptr;
+    if (t->op == NAME) return t->u.sym;
+    return t->op == STREF || (t->op == UMULT && !t->right) ? pointee_name_if_known(t->left) : nullptr;
 }
 
 // ---- Substitution

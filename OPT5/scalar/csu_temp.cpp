@@ -1,9 +1,15 @@
+// Structure results go where they are wanted.
+//
+// A call's result that goes to a temporary, and from there to a local, goes to the local. That holds where nothing else
+// names the temporary, and neither the call nor anything outside of this function can see the local.
+//
 // A function that returns a structure through a hidden pointer, and fills a local that every path copies to where that
 // points, fills the place itself.
 //
 // The place is an object of the caller that nothing else names before the function returns: what the local is given, it
 // may be given at once. The pointer is used for nothing but those copies, so that no access through it stands between
 // them and the accesses of the local; and no copy is followed by anything that could still change the local.
+#include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -11,7 +17,9 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
 
+#include <unordered_map>
 #include <unordered_set>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -124,10 +132,64 @@ private:
     int copies = 0;
 };
 
+// ---- In the caller
+
+bool is_private_structure(const NODE* t) {
+    return t->op == NAME && t->u.sym->is_automatic() && only_its_name_reaches(t->u.sym) &&
+           !type_may_contain_volatile(t->u.sym->type);
+}
+
+// `t = f(...); v = t;`
+bool passes_result_on(const LIST* s) {
+    const NODE* call = s->first;
+    if (call->op != STASG || call->left->op != NAME || (call->right->op != CALL && call->right->op != UCALL) ||
+        !s->rest)
+        return false;
+    const NODE* copy = s->rest->first;
+    return copy->op == STASG && copy->left->op == NAME && copy->right->op == NAME &&
+           copy->right->u.sym == call->left->u.sym && copy->left->u.sym != call->left->u.sym;
+}
+
+bool may_take_result(const LIST* s) {
+    const NODE *temp = s->first->left, *local = s->rest->first->left;
+    return is_private_structure(temp) && is_private_structure(local) &&
+           exact_types(temp->u.sym->type->stqs(), local->u.sym->type->stqs()) &&
+           !sym_appears_in_tree(local->u.sym, s->first->right);
+}
+
+void hand_results_over() {
+    std::vector<LIST*> calls;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s; s = s->rest)
+            if (passes_result_on(s)) calls.push_back(s);
+    if (calls.empty()) return;
+    init_alias_marks();
+    std::unordered_map<const SYMTAB*, int> names;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            if (calls_setjmp(s->first)) return;
+            for_each_node(s->first, [&](const NODE* t) { names[t->op == NAME ? t->u.sym : nullptr]++; });
+        }
+    constexpr int SET_AND_COPIED = 2;
+    for (LIST* s : calls) {
+        const SYMTAB* temp = s->first->left->u.sym;
+        if (names[temp] != SET_AND_COPIED || !may_take_result(s)) continue;
+        LIST* copy = s->rest;
+        if (print_debug)
+            debug_printf("\nsubst_csu_returning_temp_for_local_var()\n  is substituting %s\n    for temporary  %s\n\n",
+                         copy->first->left->u.sym->name, temp->name);
+        std::swap(s->first->left, copy->first->left);
+        s->rest = copy->rest;
+        erase_tree(copy->first);
+        delete copy;
+    }
+}
+
 } // namespace
 
 void subst_csu_returning_temp_for_local_var() {
     FUNINFO* f = currfuninfo;
+    if (f->bb_list) hand_results_over();
     SYMTAB* hidden = f->csu_return_sym ? f->csu_return_sym : f->ret_by_cctor_sym;
     if (hidden && f->bb_list) SUBSTITUTION(hidden).run();
 }

@@ -163,12 +163,10 @@ public:
 private:
     static bool is_candidate(const SYMTAB* sym) {
         const FUNINFO* f = currfuninfo;
-        if (sym->level != 2 || (sym->sclass != SC_AUTO && sym->sclass != SC_REGISTER && sym->sclass != SC_REGISTER2))
-            return false;
         if (!sym->type->is_csu() && !sym->type->is_array()) return false;
-        if (sym->is_aliased() || sym->lives_in_others || sym->hosts_others || sym->type->is_volatile()) return false;
-        if (sym == f->csu_return_sym || sym == f->ret_by_cctor_sym) return false;
-        return !f->has_eh() || !sym_appears_in_EHT(sym);
+        if (sym->lives_in_others || sym->hosts_others || sym == f->csu_return_sym || sym == f->ret_by_cctor_sym)
+            return false;
+        return sym->is_automatic() && only_its_name_reaches(sym);
     }
 
     int bit_of_target(const NODE* lvalue) const {

@@ -1,4 +1,4 @@
-// Walks over the trees of a function, for the sources of this room.
+// Walks over the trees of a function.
 #pragma once
 
 #include "OPT5/ir/bblk.h"
@@ -31,6 +31,15 @@ void for_each_subtree(const NODE* t, const F& visit) {
 inline bool writes_left_operand(int op) {
     constexpr int WRITES_LEFT = 1;
     return side_effects[op] == WRITES_LEFT || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
+}
+
+// The NAME that a write to an lvalue goes to, wholly or in part; null where it goes through a pointer.
+template <class N>
+N* written_name(N* t) {
+    while (t->op == STDOT || t->op == REAL || t->op == IMAG || t->op == VFIELD || t->op == SIMDHI || t->op == SIMDLO ||
+           t->op == VRCONV || t->op == DDNODE || t->op == IDENTITY)
+        t = t->left;
+    return t->op == NAME ? t : nullptr;
 }
 
 // How the pointer variables of a function get their values.

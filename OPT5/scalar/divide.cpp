@@ -15,12 +15,14 @@
 // Runs late: the passes before know more of a division than of what it becomes.
 #include "OPT5/scalar/divide.h"
 
+#include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
@@ -270,6 +272,14 @@ bool contains_division(NODE* t) {
     return found;
 }
 
+const KNOWN_SIGNS* signs = nullptr; // of the function whose divisions are looked for, where they are known
+
+bool bounds_of_dividend(const NODE* x, INT65* low, INT65* high) {
+    if (!calculate_bounds(x, nullptr, low, high)) return false;
+    if (signs && low->is_negative() && !high->is_negative() && signs->is_nonnegative(x)) *low = INT65(0);
+    return true;
+}
+
 NODE* without_divisions(NODE* t, bool* changed) {
     if (!t || is_left_alone(t)) return t;
     t = spelled_out(t);
@@ -300,7 +310,7 @@ bool find_reciprocal(uint64_t divisor, uint64_t limit, uint64_t product_limit, i
 NODE* warp_DIV_to_MULT(NODE* t) {
     TYPE* type = type_of_division(t);
     INT65 low, high;
-    if (!type || !calculate_bounds(t->left, nullptr, &low, &high) || (low.is_zero() && high.is_zero())) return t;
+    if (!type || !bounds_of_dividend(t->left, &low, &high) || (low.is_zero() && high.is_zero())) return t;
     const INT65 c = t->right->u.lval;
     const long cost = cost_of_sequence(t->op, c, type, low, high);
     if (cost < 0 || cost + cost_for_DIV_to_MULT_expr(t->left) >= cost_of_division(t)) return t;
@@ -320,15 +330,22 @@ NODE* warp_DIV_to_MULT(NODE* t) {
 }
 
 void transform_DIVs_by_ICONs() {
-    bool any = false;
+    std::vector<LIST*> divisions;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s; s = s->rest) {
-            bool changed = false;
-            if (!contains_division(s->first)) continue;
-            s->first = without_divisions(s->first, &changed);
-            if (changed) s->first = simp_tree(s->first, nullptr);
-            any |= changed;
-        }
+        for (LIST* s = bb->statements; s; s = s->rest)
+            if (contains_division(s->first)) divisions.push_back(s);
+    if (divisions.empty()) return;
+    init_alias_marks();
+    const KNOWN_SIGNS known;
+    signs = &known;
+    bool any = false;
+    for (LIST* s : divisions) {
+        bool changed = false;
+        s->first = without_divisions(s->first, &changed);
+        if (changed) s->first = simp_tree(s->first, nullptr);
+        any |= changed;
+    }
+    signs = nullptr;
     if (!any) return;
     sym_split(currfuninfo);
     promote_all_embedded_assignments();

@@ -14,6 +14,7 @@
 
 #include "OPT5/alias/address_form.h"
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
@@ -153,19 +154,6 @@ struct COUNTS {
     bool is_pinned = false;
 };
 
-// The NAME that a write goes to, wholly or in part; null where it goes through a pointer.
-NODE* written_name(NODE* t) {
-    while (t->op == STDOT || t->op == REAL || t->op == IMAG || t->op == VFIELD || t->op == SIMDHI || t->op == SIMDLO ||
-           t->op == VRCONV || t->op == DDNODE || t->op == IDENTITY)
-        t = t->left;
-    return t->op == NAME ? t : nullptr;
-}
-
-bool assigns(int op) {
-    constexpr int WRITES_LEFT = 1;
-    return side_effects[op] == WRITES_LEFT || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
-}
-
 class SWEEP {
 public:
     SWEEP() { counts.max_load_factor(1.0); }
@@ -220,7 +208,7 @@ void SWEEP::count_tree(NODE* t) {
             ++counts[t->u.sym].uses;
             return;
         }
-        if (!assigns(t->op) || !t->left) {
+        if (!writes_left_operand(t->op) || !t->left) {
             count_tree(t->right);
             continue;
         }
@@ -340,7 +328,7 @@ NODE* SWEEP::subst(NODE* t) {
         return value;
     }
     if (t->op == UAND && t->left->op == NAME) return t;
-    if (assigns(t->op) && t->left && t->left->op == NAME) {
+    if (writes_left_operand(t->op) && t->left && t->left->op == NAME) {
         t->right = subst(t->right);
         if (t->op != ASG || !currfuninfo->snmap->value(t->left->u.sym, true)) return t;
         // All reads are replaced: of the assignment its value remains.

@@ -2,6 +2,7 @@
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -21,14 +22,6 @@ namespace {
 
 constexpr unsigned ADDRESS_BITS = 32;
 constexpr double ROUNDS_UNKNOWN = 12;
-
-// The NAME that a write goes to, wholly or in part; null where it goes through a pointer.
-const NODE* written_name(const NODE* t) {
-    while (t->op == STDOT || t->op == REAL || t->op == IMAG || t->op == VFIELD || t->op == SIMDHI || t->op == SIMDLO ||
-           t->op == VRCONV || t->op == DDNODE || t->op == IDENTITY)
-        t = t->left;
-    return t->op == NAME ? t : nullptr;
-}
 
 bool may_count(const SYMTAB* sym) {
     const TYPE* t = sym->type;
@@ -81,10 +74,6 @@ bool is_step(const NODE* t, INDUCTION::STEP* step) {
     }
     default: return false;
     }
-}
-
-bool is_assignment(int op) {
-    return side_effects[op] == 1 || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
 }
 
 bool is_understood(const NODE* t) {
@@ -142,7 +131,7 @@ void LOOP_FACTS::enter_statement(BBLK* bb, NODE* t) {
     }
     if (t->op == ASG && t->left->op == NAME) definitions[t->left->u.sym] = {bb, t};
     for_each_node(t, [this](const NODE* n) {
-        if (!n->left || !is_assignment(n->op)) return;
+        if (!n->left || !writes_left_operand(n->op)) return;
         if (const NODE* name = written_name(n->left)) ++assignments[name->u.sym];
     });
 }
@@ -285,7 +274,7 @@ void LOOP_FACTS::find_starts() {
         for (auto it = statements.rbegin(); it != statements.rend(); ++it) {
             NODE* root = *it;
             for_each_node(root, [&](const NODE* t) {
-                if (!t->left || !is_assignment(t->op)) return;
+                if (!t->left || !writes_left_operand(t->op)) return;
                 const NODE* name = written_name(t->left);
                 INDUCTION* i = name ? induction(name->u.sym) : nullptr;
                 if (!i || !seen.emplace(i->sym, true).second) return;

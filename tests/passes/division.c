@@ -27,6 +27,34 @@ int remainder_by_eight(int x) { return x % 8; }
 // HAS: /return .*\(unsigned long\)/
 int never_negative(int x) { return (x & 1023) / 10; }
 
+// A counter that starts from 0 and only grows needs no correction, nor does what is computed of it.
+// FUNCTION: counters
+// HAS: /i >> 3/
+// HAS: /head \+ i & 15|i \+ head & 15/
+// COUNT 0: >> 15
+int counters(int n) {
+    int i, head = 0, s = 0;
+    for (i = 0; i < n; i++) {
+        s ^= i / 8;
+        head = (head + i) % 16;
+    }
+    return s + head;
+}
+
+// Each may become negative: by steps down, by a wider or an unsigned number, by the caller, through a pointer.
+// FUNCTION: signs_unknown
+// COUNT 4: >> 15 & 3
+int signs_unknown(int n, unsigned u, int *p) {
+    int down = 2, wide = 0, wrapped = 0, pointed = 0, *q = &pointed;
+    while (down > -9) {
+        down -= 3;
+        wide += 65000L;
+        wrapped = (int)(u * 3u);
+        *(p ? p : q) -= 5;
+    }
+    return down / 4 + wide / 4 * 100 + wrapped / 4 * 1000 + n / 4 + pointed / 8;
+}
+
 // FUNCTION: widest
 // HAS: return (x >> 63 & 7) + x >> 3
 long long widest(long long x) { return x / 8; }
@@ -80,6 +108,8 @@ void volatile_in_place(void) { v /= 5; }
 int by_a_variable(int x, int y) { return x / y; }
 
 int main(void) {
+    put_i16(counters(100));
+    put_i16(signs_unknown(-7, 15000u, 0));
     static const long values[] = {0, 1, 6, 7, -1, -7, -8, 999, 1000, -1000, 32767, -32767, -32767 - 1};
     for (unsigned i = 0; i < sizeof values / sizeof *values; i++) {
         int x = (int)values[i];

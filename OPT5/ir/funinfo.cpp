@@ -325,3 +325,8 @@ bool only_its_name_reaches(const SYMTAB* sym) {
     if (!sym->is_automatic() && !(sym->level > 0 && sym->sclass == SC_PARM)) return false;
     return !sym->is_aliased() && !sym->type->is_volatile() && !sym_appears_in_EHT(sym);
 }
+
+bool is_private_name(const NODE* t) {
+    return t->op == NAME && t->u.sym && t->type->is_scalar() && !t->type->is_volatile() &&
+           only_its_name_reaches(t->u.sym);
+}

@@ -164,9 +164,7 @@ NODE* opASG_to_ASG(NODE* tree) {
     if (op == ILLOP) return tree;
     NODE *x = tree->left, *e = tree->right;
     if (x->op == DDNODE || address_has_side_effects(x)) return tree;
-    if (tree_has_side_effects(e) && !(x->op == NAME && !x->type->is_volatile() && only_its_name_reaches(x->u.sym) &&
-                                      !sym_appears_in_tree(x->u.sym, e)))
-        return tree;
+    if (tree_has_side_effects(e) && !(is_private_name(x) && !sym_appears_in_tree(x->u.sym, e))) return tree;
     NODE* value = copy_tree(x);
     TYPE* inner;
     if (op == SLL || op == SRL) {

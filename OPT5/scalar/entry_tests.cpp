@@ -1,4 +1,4 @@
-// The first test of a loop, decided by the constants that its counters start from.
+// The first test of a loop, decided by what its counters start from.
 //
 //     i = 0; goto test; body: ... test: if (i < 24) goto body;     loses the jump: the loop is entered at its body
 //     i = 0; if (i >= 24) goto behind; body: ...                   loses the test
@@ -21,7 +21,7 @@
 
 namespace {
 
-constexpr int MAX_TEST_NODES = 12;
+constexpr int MAX_TEST_NODES = 12, MAX_VALUE_NODES = 8;
 constexpr size_t MAX_TAIL = 12; // statements looked at for constants
 
 // The IF that is all of a block, or null.
@@ -70,7 +70,7 @@ private:
         for (size_t n = 0; n < tail.size() && n < MAX_TAIL && condition->op != ICON; ++n) {
             const NODE* t = tail[tail.size() - 1 - n];
             if (t->op == BRANCH || t->op == PPRAGMA || !names_a_variable_of(condition, t)) continue;
-            if (!gives_constant(t)) break;
+            if (!gives_value(t)) break;
             condition = simp_tree(with_value(condition, t->left->u.sym, t->right), nullptr);
         }
         const NODE* ways = test->right;
@@ -88,13 +88,25 @@ private:
         return names;
     }
 
-    bool gives_constant(const NODE* t) {
-        if (t->op != ASG || t->left->op != NAME || tree_is_arg_prolog(t)) return false;
-        if (t->right->op != ICON && !(t->right->type->is_pointer() && pointer_is_an_adcon(t->right))) return false;
+    // A variable is given what is computed of constants and variables that only their NAMEs reach.
+    bool gives_value(const NODE* t) {
+        if (t->op != ASG || tree_is_arg_prolog(t)) return false;
         if (!has_marks) init_alias_marks();
         has_marks = true;
-        const SYMTAB* sym = t->left->u.sym;
-        return !t->left->type->is_volatile() && sym->type->is_scalar() && only_its_name_reaches(sym);
+        return is_private_name(t->left) && count_nodes_in_tree(t->right) <= MAX_VALUE_NODES &&
+               is_known_computation(t->right);
+    }
+
+    static bool is_known_computation(const NODE* t) {
+        switch (t->op) {
+        case ICON: return true;
+        case NAME: return is_private_name(t);
+        case PLUS:
+        case MINUS: return is_known_computation(t->left) && is_known_computation(t->right);
+        case SCONV:
+        case PCONV: return is_known_computation(t->left);
+        default: return t->type->is_pointer() && pointer_is_an_adcon(t);
+        }
     }
 
     static NODE* with_value(NODE* tree, const SYMTAB* sym, const NODE* value) {

@@ -91,7 +91,7 @@ void copy_by_members(const NODE* to, const NODE* from, std::vector<NODE*>* copie
 bool is_steady_pointer(const NODE* t) {
     switch (t->op) {
     case ICON: return true;
-    case NAME: return t->u.sym->level != 0 && t->type->is_scalar() && !t->u.sym->is_aliased() && !lvalue_is_volatile(t);
+    case NAME: return is_private_name(t);
     case PLUS:
     case MINUS: return is_steady_pointer(t->left) && is_steady_pointer(t->right);
     case MULT:

@@ -35,11 +35,6 @@ bool is_whole_scalar(const NODE* lvalue) {
     return lvalue->right->op == FIELD && lvalue->right->mval && !lvalue->right->mval->is_bitfld;
 }
 
-bool is_private_variable(const NODE* t) {
-    return t->op == NAME && t->u.sym->level == 2 && !t->u.sym->is_aliased() && t->type->is_scalar() &&
-           !lvalue_is_volatile(t);
-}
-
 class KNOWN_VALUES {
 public:
     ~KNOWN_VALUES() { forget_all(); }
@@ -121,7 +116,7 @@ private:
         if (t->op != ASG || tree_is_arg_prolog(t)) return;
         const NODE *part = t->left, *value = t->right;
         if (is_whole_scalar(value)) std::swap(part, value);
-        if (!is_whole_scalar(part) || !(is_manifest_constant(value) || is_private_variable(value))) return;
+        if (!is_whole_scalar(part) || !(is_manifest_constant(value) || is_private_name(value))) return;
         SUBRANGE place;
         if (!equiv_mtypes(part->type, value->type) || !compute_subrange(part, &place)) return;
         // The assignment itself must not change the other side, or the address of the part.

@@ -23,7 +23,6 @@
 #include "OPT5/scalar/inductions.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/scalar/natural_loops.h"
-#include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
 #include "OPT5/target/target.h"
@@ -142,7 +141,6 @@ public:
     void run();
 
 private:
-    void merge();
     void split_by_offsets();
     void appraise(GROUP& g);
     void choose();
@@ -159,7 +157,6 @@ private:
     void map_test(const LOOP_TEST& test);
     NODE* last_address(const LOOP_TEST& test, const GROUP& g);
     void remove_counter(const INDUCTION& i);
-    void skip_first_test();
     NODE* start_tree(const GROUP& g);
     void report(const GROUP& g, int n);
 
@@ -531,33 +528,8 @@ void MERGE::remove_counter(const INDUCTION& i) {
     remove_statement(ahead, i.start_statement);
 }
 
-// ---- The first test
-
-// A test on top that is known to stay in the loop at first is passed by: the loop is entered behind it, and the test
-// stands at its end.
-void MERGE::skip_first_test() {
-    for (const LOOP_TEST& test : facts.tests()) {
-        int64_t last;
-        if (test.bb != loop->header || test.step_comes_first || test.bb->statements->rest) continue;
-        if (constant_rounds(test, &last) < 1) continue;
-        const NODE* targets = test.branch->right;
-        BBLK* stay = (test.stays_if_true ? targets->left : targets->right)->lbl->bblock;
-        BBLK* before = loops.block_ahead(loop);
-        if (!before || ends_in_promise(before) || stay == loop->header) return;
-        disconnect(before, loop->header);
-        subst_bb_for_bb_in_bb(stay, loop->header, before);
-        connect(before, stay);
-        return;
-    }
-}
-
 void MERGE::run() {
     if (!facts.is_usable() || facts.all_inductions().empty()) return;
-    merge();
-    skip_first_test();
-}
-
-void MERGE::merge() {
     groups = COLLECTOR(loops, loop, facts).groups();
     split_by_offsets();
     for (GROUP& g : groups) appraise(g);

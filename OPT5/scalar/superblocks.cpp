@@ -23,11 +23,6 @@ register_option pass_disable_superblock_opt("disable:superblock_opt");
 
 namespace {
 
-bool is_private_name(const NODE* t) {
-    return t->op == NAME && t->u.sym && t->type->is_scalar() && !t->type->is_volatile() &&
-           only_its_name_reaches(t->u.sym);
-}
-
 // A change of a value behind its back: the root of the statement is looked at apart.
 void collect_written(NODE* t, std::unordered_set<const SYMTAB*>& written) {
     for_each_node(t, [&](const NODE* n) {

@@ -15,6 +15,18 @@ void counted(void) {
     for (int i = 0; i < 24; i++) g[i & 7] += i * i;
 }
 
+// A start that is computed of the same variable decides the test as well.
+// FUNCTION: between
+// NOT: goto
+// HAS: /^L\d+:/
+// COUNT 1: goto
+int between(const int *from) {
+    const int *p = from, *end = from + 8;
+    int s = 0;
+    while (p != end) s = s * 3 + *p++;
+    return s;
+}
+
 // What the loop starts from is not known here: a call, an assembly text or a pointer may have changed it.
 // FUNCTION: unknown
 // HAS: /^goto L\d+$/
@@ -60,6 +72,7 @@ int main(void) {
     int p[8] = {0};
     counted();
     unknown();
+    put_i16(between(g));
     put_i16(stepped(1));
     put_i32(promised(4, p));
     put_i16(g[3] + g[4] + n);

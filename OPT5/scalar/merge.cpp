@@ -13,6 +13,7 @@
 // the pointer meets its last value exactly.
 #include "OPT5/scalar/merge.h"
 
+#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/global.h"
@@ -198,7 +199,7 @@ void MERGE::split_by_offsets() {
 
 double cost_of_tree(const NODE* t) {
     double cost = 0;
-    for_each_node(const_cast<NODE*>(t), [&](const NODE* n) { cost += 1 + (n->op == MULT ? MULTIPLY_COST : 0); });
+    for_each_subtree(t, [&](const NODE* n) { cost += 1 + (n->op == MULT ? MULTIPLY_COST : 0); });
     return cost;
 }
 

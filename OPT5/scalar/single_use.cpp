@@ -5,6 +5,7 @@
 // only if that does nothing before it reads it. The read may stand under a condition: then less is computed.
 #include "OPT5/scalar/merge.h"
 
+#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -42,7 +43,7 @@ private:
     }
 
     void count(const NODE* root) {
-        for_each_node(const_cast<NODE*>(root), [this](const NODE* t) {
+        for_each_subtree(root, [this](const NODE* t) {
             if (t->op != NAME) return;
             if (COUNTS* c = counts_of(t->u.sym)) ++c->mentions;
         });
@@ -84,7 +85,7 @@ private:
 
     bool reads_variables_alone(const NODE* value) {
         bool alone = true;
-        for_each_node(const_cast<NODE*>(value), [&](const NODE* t) {
+        for_each_subtree(value, [&](const NODE* t) {
             if (t->op == UMULT || t->op == STREF || t->op == STDOT || (t->op == NAME && !counts_of(t->u.sym)))
                 alone = false;
         });
@@ -94,7 +95,7 @@ private:
     // Whether `statement` may change a variable of the value. The target of its root is written last.
     static bool assigns_part(const NODE* statement, const NODE* value, bool with_root) {
         bool assigns = false;
-        for_each_node(const_cast<NODE*>(statement), [&](const NODE* t) {
+        for_each_subtree(statement, [&](const NODE* t) {
             if (assigns || !t->left || (side_effects[t->op] != 1 && t->op != ARASG) || (t == statement && !with_root))
                 return;
             const NODE* target = t->left;

@@ -150,6 +150,7 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     }
     if (lvalue_is_volatile(a) && lvalue_is_volatile(b))
         return true; // what their order is for may lie outside of memory
+    // That only one is volatile says nothing: a plain object may be written through a pointer to volatile.
     if (a->op == NAME && b->op == NAME) return object_symbols_may_alias(a->u.sym, b->u.sym);
     const ADDRESS_FORM x = address_form(a), y = address_form(b);
     const SYMTAB *object_a = x.known_object(), *object_b = y.known_object();

@@ -258,7 +258,7 @@ void prbbinfix(FILE* out) {
 void prbblocks(BBLK* first, BBLK* last) {
     if (!fdebug) return;
     for (BBLK* bb = first; bb; bb = bb == last ? nullptr : bb->dflink) {
-        debug_printf("%s uon=%d dfn=%d depth=%d", bb->str(), bb->uon, bb->dfn, bb->depth);
+        debug_printf("%s uon=%d dfn=%d depth=%d", bb->str(), bb->uon, bb->dfn, int(bb->depth));
         for (const EDGE* e = bb->predecessors; e; e = e->rest) debug_printf(" <-%s", e->first->str());
         for (const EDGE* e = bb->successors; e; e = e->rest) debug_printf(" ->%s", e->first->str());
         debug_printf("\n");

@@ -49,7 +49,7 @@ public:
     double dFreqIn = -1.0, dFreqOut = -1.0;
     int uon = 0; // source order number from 1; -1 for a block made after `buildcfg`
     int dfn = 0;
-    int depth = 0;
+    uint8_t depth = 0; // of loops around it, as `allocate_regs` counted them
     bool visited = false;
     int cycle_count = -1;
 

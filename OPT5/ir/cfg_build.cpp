@@ -253,7 +253,8 @@ void number_blocks(FUNINFO* f, BBLK* all) {
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
         OPT_ASSERT(!bb->visited);
         bb->visited = true;
-        for (EDGE* e = bb->successors; e; e = e->rest) e->first->predecessors = mkedge(bb, e->first->predecessors);
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            e->first->predecessors = new EDGE{bb, e->prob, e->first->predecessors};
     }
     drop_unreachable_blocks(f, all);
     clear_visited();

@@ -21,7 +21,10 @@ public:
         if (f->bb_list->predecessors) error(" +++++ Entry block %s has predecessors\n", f->bb_list->str());
         check_links();
         check_reachability();
-        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) check_block(bb);
+        // What follows from the branches is mended first; what then has no branch behind it is an error.
+        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) check_branch(bb);
+        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) check_successors(bb);
+        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) check_predecessors(bb);
         return finish();
     }
 
@@ -77,18 +80,23 @@ private:
             if (!seen.count(bb)) fixed(" ----- %s cannot be reached from the entry block\n", bb->str());
     }
 
-    void check_block(BBLK* bb) {
+    void check_successors(BBLK* bb) {
         for (const EDGE* e = bb->successors; e; e = e->rest) {
             if (!listed.count(e->first)) {
                 error(" +++++ %s has bogus successor: %s\n", bb->str(), e->first->str());
             } else if (!edge_memberp(bb, e->first->predecessors)) {
-                error(" +++++ %s precedes %s but %s doesn't succeed %s\n", bb->str(), e->first->str(), e->first->str(), bb->str());
+                fixed(" ----- %s succeeds %s but %s doesn't precede %s\n", e->first->str(), bb->str(), bb->str(),
+                      e->first->str());
+                e->first->predecessors = add_edge(bb, e->first->predecessors, e->prob);
             }
         }
+    }
+
+    void check_predecessors(const BBLK* bb) {
         for (const EDGE* e = bb->predecessors; e; e = e->rest)
             if (!listed.count(e->first) || !edge_memberp(bb, e->first->successors))
-                error(" +++++ %s succeeds %s but %s doesn't precede %s\n", bb->str(), e->first->str(), e->first->str(), bb->str());
-        check_branch(bb);
+                error(" +++++ %s precedes %s but %s doesn't succeed %s\n", e->first->str(), bb->str(), bb->str(),
+                      e->first->str());
     }
 
     void check_branch(BBLK* bb) {

@@ -259,7 +259,9 @@ void infix_writer::expr(const NODE* t, int outer) {
     case CALL:
     case UCALL: return call(t);
     case ICALL:
-    case MCALL: return as_call(t->u.name, t->left, nullptr);
+    case MCALL:
+        if (const NODE* pointer = pointer_behind_builtin(t)) return expr(pointer, outer);
+        return as_call(t->u.name, t->left, nullptr);
     case UMULT: return as_call("U*2", t->left, t->right);
     case STARG:
     case SSA_USE:

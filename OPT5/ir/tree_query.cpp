@@ -395,12 +395,22 @@ bool pointer_contains_adcon_term(const NODE* t) {
     }
 }
 
+const NODE* pointer_behind_builtin(const NODE* t) {
+    if ((t->op != ICALL && t->op != MCALL) || !t->left || !type_ops_seams.builtin_points_into_operand_0) return nullptr;
+    if (!type_ops_seams.builtin_points_into_operand_0(t->u.name)) return nullptr;
+    return arg_list_lookup(t->left, 0);
+}
+
 SYMTAB* pointee_name_if_known(const NODE* p) {
     for (;;) {
         while (is_transparent(p->op) || ((p->op == PCONV || p->op == ISP2CHAR) && p->left->type->is_pointer()))
             p = p->left;
-        if (p->op != PLUS && p->op != MINUS) break;
-        p = p->op == PLUS && !p->left->type->is_pointer() ? p->right : p->left;
+        if (const NODE* operand = pointer_behind_builtin(p))
+            p = operand;
+        else if (p->op == PLUS || p->op == MINUS)
+            p = p->op == PLUS && !p->left->type->is_pointer() ? p->right : p->left;
+        else
+            break;
     }
     return p->op == UAND ? object_name_if_known(p->left) : nullptr;
 }

@@ -89,6 +89,8 @@ bool tree_addresses_an_argument(const NODE* t);  // takes the address of a param
 SYMTAB* map_sym_to_parm(const SYMTAB* sym);
 SYMTAB* map_parm_to_sym(const SYMTAB* parm);
 SYMTAB* object_name_if_known(const NODE* tree); // the object that an lvalue lies in for certain, or null
+// The pointer that a call of a built-in derives its value from, or null for any other tree.
+const NODE* pointer_behind_builtin(const NODE* tree);
 // The object that a pointer points into for certain, or null: whatever is added, it stays in it.
 SYMTAB* pointee_name_if_known(const NODE* pointer);
 

@@ -62,6 +62,7 @@ struct TYPE_OPS_SEAMS {
     NODE* (*fix_BIF_types)(NODE* call) = nullptr;
     INT65 (*find_known_zeros)(const NODE* tree, TYPE* type) = nullptr;
     bool (*calculate_bounds)(const NODE* tree, struct LOOP* loop, INT65* min, INT65* max) = nullptr;
+    bool (*builtin_points_into_operand_0)(const char* name) = nullptr; // its value is that pointer, or a place behind it
     bool (*constant_divides_expr)(INT65 constant, const NODE* tree) = nullptr;
 };
 extern TYPE_OPS_SEAMS type_ops_seams;

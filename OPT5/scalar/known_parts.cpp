@@ -146,7 +146,7 @@ private:
 
 void lcse_subrange_assignments() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
-    init_aliasing_info(false);
+    init_aliasing_info(true);
     KNOWN_VALUES values;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) values.block(bb);
     reset_alias_info();

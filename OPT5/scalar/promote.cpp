@@ -303,7 +303,7 @@ void promote_all_embedded_assignments() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         if (block_has_embedded(bb)) blocks.push_back(bb);
     if (blocks.empty()) return;
-    init_aliasing_info(false);
+    init_aliasing_info(true);
     bool changed = false;
     for (BBLK* bb : blocks) changed |= promote_embedded_assignments_in_bb(bb);
     if (changed) sym_split(currfuninfo);

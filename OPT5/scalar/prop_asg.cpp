@@ -6,6 +6,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/scalar/natural_loops.h"
 #include "OPT5/target/target.h"
 
 namespace {
@@ -40,9 +41,27 @@ void prop_asg_into_if(BBLK* bb) {
 
 namespace {
 
+// An edge against the order of the blocks is what any loop has.
+bool has_backward_edge() {
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (e->first->dfn <= bb->dfn) return true;
+    return false;
+}
+
+void count_loops_around_blocks() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->depth = 0;
+    if (!has_backward_edge()) return;
+    const NATURAL_LOOPS loops;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const NATURAL_LOOP* loop = loops.around(bb); loop && bb->depth < UINT8_MAX; loop = loop->parent)
+            ++bb->depth;
+}
+
 void prepare_allocation() {
     find_live_variables(0, false);
     reset_alias_info();
+    count_loops_around_blocks();
     BBLK* const entry = currfuninfo->bb_list;
     for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) prop_asg_into_if(bb);
     lva_cleanup();

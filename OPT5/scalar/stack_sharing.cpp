@@ -18,6 +18,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
+#include "OPT5/target/target.h"
 #include "UTIL/abort.h"
 
 #include <algorithm>
@@ -442,7 +443,8 @@ void SHARING::run() {
 void build_stack_sharing_type() {
     LS* outermost = LS::level_2_scope();
     const bool has_scopes = outermost && outermost->first_child && currfuninfo->bb_list;
-    if (has_scopes && !currfuninfo->stack_is_laid_out) {
+    const bool shares = opt_level() > 0 || has_hardware_float();
+    if (has_scopes && shares && !currfuninfo->stack_is_laid_out) {
         if (print_debug && fdebug) currfuninfo->ls_root->print(fdebug);
         SHARING().run();
         init_stack_sharing();

@@ -287,7 +287,7 @@ private:
 
 void elim_dead_subrange_assigns() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
-    init_aliasing_info(false);
+    init_aliasing_info(true);
     DEAD_STORES stores;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) stores.run(bb);
     reset_alias_info();

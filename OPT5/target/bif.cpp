@@ -181,6 +181,11 @@ bool builtin_returns_1_or_0(const char* name) {
     return bif && bif->has(RETURNS_1_OR_0);
 }
 
+bool builtin_points_into_operand_0(const char* name) {
+    const BIF* bif = find_BIF_descriptor(name);
+    return bif && bif->has(POINTS_INTO_OPERAND_0);
+}
+
 } // namespace
 
 // ---- Making
@@ -353,6 +358,7 @@ void init_BIF_descriptors() {
         if (!entry.second->has(IS_GENERIC)) normalize_types(entry.second.get());
     type_ops_seams.builtin_return_type = builtin_return_type;
     type_ops_seams.builtin_returns_1_or_0 = builtin_returns_1_or_0;
+    type_ops_seams.builtin_points_into_operand_0 = builtin_points_into_operand_0;
     type_ops_seams.fix_BIF_types = fix_BIF_types;
     dump_BIF_descriptors(true, false);
     dump_BIF_descriptors(false, true);

@@ -148,8 +148,8 @@ void allocate_regs() {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'allocate_regs' ----------\n");
     if (prepare_allocation_hook && currfuninfo->bb_list) prepare_allocation_hook();
     init_reg_defs();
-    sort_stack_variables(currfuninfo->new_syms);
-    sort_stack_variables(currfuninfo->scalar_syms);
+    for (SYMTAB* list : {currfuninfo->new_syms, currfuninfo->scalar_syms, currfuninfo->memory_syms})
+        sort_stack_variables(list); // the last holds the structures
     wrapup_allocation();
 }
 

@@ -1,4 +1,5 @@
-// Locals that only their names reach may live in registers; those reached by pointers, and aggregates, may not.
+// Locals that only their names reach may live in registers, structures too; those reached by pointers, and arrays, may
+// not.
 // RUN: --opt_level=2
 #include <zrun.h>
 
@@ -28,7 +29,26 @@ int aggregate(int n) {
     return cells[0] + cells[n];
 }
 
+struct record {
+    int v[4];
+    long l;
+    volatile int* port;
+};
+
+// FUNCTION: structures
+// HAS: /\d+ own: .*class 22,.*level 2/
+// HAS: /\d+ shown: .*class 1,.*level 2/
+int structures(struct record* from, int n) {
+    struct record own = *from, shown = *from;
+    set(&shown.v[1]);
+    own.l += n;
+    *from = own;
+    return (int)own.l + shown.v[1];
+}
+
 int main(void) {
+    static struct record first = {{1, 2, 3, 4}, 5};
+    put_i16(structures(&first, 2) + first.v[2]);
     put_i16(plain(4));
     put_i16(reached(5));
     put_i16(aggregate(2));

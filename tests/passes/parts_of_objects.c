@@ -92,6 +92,20 @@ void holds_pointer(int* q, int x) {
     *t[x & 1].p = x * 17;
 }
 
+// FUNCTION: restricted
+// HAS: y = k
+// NOT: * 17
+int restricted(int* restrict p, int* restrict q, int x) {
+    int k = x * 19, y;
+    *p = k;
+    *q = x * 18;
+    y = *p;
+    p[1] = x * 17;
+    *q ^= y;
+    p[1] = x * 18;
+    return y - k;
+}
+
 // ---- Stores that stay
 
 // FUNCTION: read_between
@@ -211,5 +225,6 @@ int main(void) {
     put_i32(stored_value(two, 10) + stored_value(two + 1, 1) + argument(two, 8));
     changed_between(two, &two[0].a, 11);
     put_i32(two[0].b);
+    put_i32(restricted(&two[0].a, &two[1].a, 7));
     return 0;
 }

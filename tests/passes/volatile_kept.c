@@ -28,7 +28,19 @@ void unused(void) {
     (void)other;
 }
 
+// What is no volatile object may be written as one.
+// FUNCTION: written_as_volatile
+// NOT: return 11
+int written_as_volatile(int x) {
+    int plain = 10, *p = &plain;
+    put_i16(*p);
+    plain = 10;
+    *(volatile int*)(x ? p : 0) = 20;
+    return plain + 1;
+}
+
 int main(void) {
+    put_i16(written_as_volatile(1));
     pulse();
     put_i16(twice());
     unused();

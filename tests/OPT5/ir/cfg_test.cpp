@@ -161,7 +161,7 @@ TEST_F(CfgTest, ForwardEdgesMayStayCritical) {
     EXPECT_TRUE(valid());
 }
 
-TEST_F(CfgTest, ValidationFindsAndMendsAMissingSuccessor) {
+TEST_F(CfgTest, ValidationFindsAndMendsMissingEdges) {
     SYMTAB* x = local("x");
     branch_if(x, 1, 2);
     define(1);
@@ -171,6 +171,9 @@ TEST_F(CfgTest, ValidationFindsAndMendsAMissingSuccessor) {
     build();
     BBLK* entry = currfuninfo->bb_list;
     disconnect(entry, block_of(2));
+    EXPECT_EQ(validate_cfg(), 0) << "mended";
+    EXPECT_TRUE(has_edge(entry, block_of(2)));
+    block_of(2)->predecessors = remove_edge(entry, block_of(2)->predecessors);
     EXPECT_EQ(validate_cfg(), 0) << "mended";
     EXPECT_TRUE(has_edge(entry, block_of(2)));
     // An edge that no branch backs is not for the checker to remove.

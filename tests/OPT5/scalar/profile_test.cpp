@@ -53,6 +53,8 @@ TEST_F(ProfileTest, CountsGiveFrequenciesAndProbabilities) {
     EXPECT_NEAR(block_of(4)->dFreqIn, 1000, 40) << "the loop converges from below";
     EXPECT_NEAR(edge_memberp(block_of(4), block_of(4)->successors)->prob, 0.9, 1e-9);
     EXPECT_NEAR(edge_memberp(block_of(4), block_of(4)->predecessors)->prob, 0.9, 1e-9);
+    rebuildcfg();
+    EXPECT_NEAR(edge_memberp(block_of(4), block_of(4)->predecessors)->prob, 0.9, 1e-9) << "the edge is still there";
 }
 
 TEST_F(ProfileTest, WithoutDataNothingIsAnnotatedAndTheLayoutStays) {

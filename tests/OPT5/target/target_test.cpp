@@ -69,6 +69,14 @@ TEST_F(Target, QuestionsAboutTrees) {
     EXPECT_EQ(cost_for_DIV_to_MULT_expr(bin(DIV, bin(PLUS, copy_tree(x), icon(1)), icon(3))), 670);
 }
 
+TEST_F(Target, PointersBehindBuiltins) {
+    SYMTAB* x = symbol("x", tp->int_t);
+    NODE* byte = mk_ICALL("__byte", args({address(name(x)), icon(1)}), tp->mk_ptr(tp->int_t));
+    EXPECT_EQ(show(byte), "&x");
+    EXPECT_EQ(object_name_if_known(deref(byte)), x);
+    EXPECT_EQ(object_name_if_known(deref(mk_ICALL("__other", args({address(name(x))}), byte->type))), nullptr);
+}
+
 TEST_F(Target, StackVariables) {
     init_reg_defs();
     SYMTAB *a = symbol("a", tp->int_t), *v = symbol("v", tp->mk_qual(tp->int_t, QUAL_VOLATILE)),

@@ -5,8 +5,8 @@
 // `object_name_if_known` finds the array again.
 #include "OPT5/alias/alias.h"
 
+#include "OPT5/alias/effects.h"
 #include "OPT5/alias/state.h"
-#include "OPT5/alias/walks.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 
@@ -47,13 +47,12 @@ void mark_addressed(const NODE* t, bool is_access_address) {
             t = next;
             continue;
         case STDOT:
-            while (next->op == STDOT) next = next->left;
+            next = without_members(next);
             if (next->op == NAME) return;
             break;
         case UAND:
         case ARGREF: {
-            const NODE* object = t->left;
-            while (object->op == STDOT) object = object->left;
+            const NODE* object = without_members(static_cast<const NODE*>(t->left));
             if (object->op == NAME) {
                 if (t->op == ARGREF || !is_access_address || !is_plain_array(t->left->type)) mark(object->u.sym);
                 return;
@@ -97,10 +96,6 @@ void for_each_symbol(const F& visit) {
 }
 
 bool is_vector_or_complex(const TYPE* type) { return type->is_vector() || type->is_vpred() || type->is_complex(); }
-
-bool is_part_selector(int op) {
-    return op == REAL || op == IMAG || op == VFIELD || op == SIMDHI || op == SIMDLO || op == VRCONV || op == STDOT;
-}
 
 } // namespace
 
@@ -165,8 +160,7 @@ void reset_alias_info() {
 }
 
 SYMTAB* get_vector_or_complex_symbol(const NODE* t) {
-    while (is_part_selector(t->op)) t = t->left;
-    SYMTAB* sym = object_name_if_known(t);
+    SYMTAB* sym = object_name_if_known(object_of_place(t));
     return sym && is_vector_or_complex(sym->type) ? sym : nullptr;
 }
 

@@ -1,4 +1,5 @@
-// Which memory references may meet: the one place that answers for every pass that moves a load or a store.
+// Which memory references may meet: the one place that answers for every pass that moves a load or a store. What trees
+// read and change is asked of effects.h.
 //
 // Every question here is a "may": where it cannot be decided the answer is true. Lvalues are NAME, UMULT, STREF and
 // STDOT trees, also under DDNODE, SSA operators and the transparent wrappers; they are borrowed and left alone.
@@ -9,8 +10,6 @@
 
 #include <vector>
 
-class BBLK;
-class BITVEC;
 class FUNINFO;
 class NODE;
 class SYMTAB;
@@ -66,28 +65,6 @@ bool build_the_umults_alias_free_by_predication_lists(const NODE* a, const NODE*
 // Whether the points-to environments of two accesses leave them a common place; null while there are none.
 extern bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b);
 void add_antialiasing_loop_assertion(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q);
-
-// ---- Effects
-// Whether evaluating `a` may change what `t` reads: the objects, and the addresses it reads them by.
-bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t);
-bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t);
-// Whether evaluating `a` may write to, or may read or write, the object of `lvalue`.
-bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue);
-bool tree_touches_lvalue(const NODE* a, const NODE* lvalue);
-// What a call does outside its own frame: to the object of `lvalue`, which may be null for "anything at all".
-bool call_may_modify(const NODE* call, const NODE* lvalue);
-bool call_may_read(const NODE* call, const NODE* lvalue);
-bool call_assigns_thru_byref_args(const NODE* call);
-bool byref_arg_is_not_assigned_thru(int index, SYMTAB* callee); // argument from 0; null: unknown
-
-// The lvalues that a pass keeps facts on, numbered by their place; a set of `kill_aliases_*` has a bit for each. Trees
-// other than lvalues are killed with what they read. The trees must stand until `clean_up_alias_analysis_bitvecs_etc`.
-void compute_alias_sets(const std::vector<const NODE*>& lvalues);
-void kill_aliases_of_lvalue(const NODE* lvalue, BITVEC* set);
-// What an access of unknown address changes, in `scope` if that is not null; `tree` is the access or null.
-void kill_aliases_indirect(const LS* scope, const NODE* tree, BITVEC* set, unsigned flags = 0);
-void kill_aliases_on_call(const NODE* call, BITVEC* set);
-void kill_assertions(BITVEC* set);
 
 // ---- Shapes
 TYPE* true_type(const NODE* tree, bool* exact); // the declared type of the object that an lvalue accesses

@@ -1,26 +1,20 @@
 // What evaluating a tree does to memory, and which facts about memory it ends.
-#include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/address_form.h"
+#include "OPT5/alias/alias.h"
 #include "OPT5/alias/state.h"
-#include "OPT5/alias/walks.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/target/bif.h"
 
+#include <algorithm>
 #include <cstring>
 
 namespace {
 
 bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
-
-const NODE* written_lvalue(const NODE* t) {
-    while (t->op == SIMDHI || t->op == SIMDLO || t->op == REAL || t->op == IMAG || t->op == VRCONV || t->op == VFIELD ||
-           t->op == DDNODE || t->op == IDENTITY || (t->op >= SSA_USE && t->op <= SSA_CHI))
-        t = t->left;
-    return t;
-}
 
 // A pointer handed out may be used for any address in the object that it points into, and, where that is not known, in
 // any object that pointers reach.
@@ -100,26 +94,41 @@ bool asm_may_access(const NODE* t, const NODE* lvalue) {
     return !object || object->level == 0 || may_be_reached_by_pointers(object);
 }
 
+// Operators that the table calls unknown and that change nothing.
 bool is_inert(int op) {
-    return op == PPRAGMA || op == NASSERT || op == ASSERT || op == LABELDEF || op == NOP || op == SKIP;
+    switch (op) {
+    case NOP:
+    case PCOMMA:
+    case COMMAOP:
+    case DDNODE:
+    case NASSERT:
+    case ASSERT:
+    case VREG:
+    case PPRAGMA:
+    case BGNBLOCK:
+    case ENDBLOCK: return true;
+    default: return false;
+    }
+}
+
+bool is_operation_on_memory(int op) { return op_is_call(op) || op_is_intrinsic(op) || op == MEMCPY; }
+
+bool place_may_meet(const NODE* place, const NODE* lvalue) {
+    bool meets = false;
+    effects::visit_places(nullptr, place, [&meets, lvalue](const WRITE& w) {
+        meets = meets || lvalues_may_be_aliased(access_of_place(w.place), lvalue);
+    });
+    return meets;
 }
 
 // One node of a tree, its operands aside.
 bool node_may_modify(const NODE* t, const NODE* lvalue) {
-    if (writes_left_operand(t->op)) return !t->left || lvalues_may_be_aliased(written_lvalue(t->left), lvalue);
-    if (op_is_call(t->op) || op_is_intrinsic(t->op) || t->op == MEMCPY) return call_may_modify(t, lvalue);
+    if (writes_left_operand(t->op)) return !t->left || place_may_meet(t->left, lvalue);
+    if (is_operation_on_memory(t->op)) return call_may_modify(t, lvalue);
     if (t->op == ASM) return asm_may_access(t, lvalue);
     // A volatile access is an event, that keeps its order to other events.
     if (is_lvalue(t) && lvalue_is_volatile(t)) return lvalue_is_volatile(lvalue);
-    if (is_inert(t->op) || t->op == PCOMMA || t->op == COMMAOP || t->op == DDNODE) return false;
-    return side_effects[t->op] == 255;
-}
-
-template <class P>
-bool any_subtree(const NODE* t, const P& predicate) {
-    for (; t; t = t->left)
-        if (predicate(t) || any_subtree(t->right, predicate)) return true;
-    return false;
+    return op_has_effect(t->op) && !op_transfers_control(t->op) && !is_inert(t->op);
 }
 
 // The outermost lvalues that `t` reads and those that their addresses are computed from.
@@ -127,8 +136,7 @@ template <class P>
 bool any_lvalue_read(const NODE* t, const P& predicate) {
     for (; t; t = t->left) {
         if (t->op == UAND || t->op == ARGREF) { // the address alone
-            const NODE* object = t->left;
-            while (object->op == STDOT) object = object->left;
+            const NODE* object = without_members(static_cast<const NODE*>(t->left));
             if (object->op == NAME) return t->op == ARGREF && predicate(object);
             if (object->op == UMULT || object->op == STREF) {
                 if (object->op == UMULT && any_lvalue_read(object->right, predicate)) return true;
@@ -170,6 +178,25 @@ bool byref_arg_is_not_assigned_thru(int index, SYMTAB* callee) {
 
 // ---- Trees
 
+bool may_write_indirectly(const NODE* t) {
+    if (is_operation_on_memory(t->op)) return call_may_modify(t, nullptr);
+    if (t->op == ASM) return !tree_is_ASM_comment(t);
+    return op_has_effect(t->op) && !op_transfers_control(t->op) && !writes_left_operand(t->op) && !is_inert(t->op);
+}
+
+const NODE* place_of_pointer(const NODE* pointer) {
+    const NODE* basis = pointer ? pointer_basis(pointer) : nullptr;
+    return basis && basis->op == UAND ? basis->left : nullptr;
+}
+
+SYMTAB* assigned_variable(const NODE* t) {
+    return opcode_is_ASG(t->op) && t->left->op == NAME ? t->left->u.sym : nullptr;
+}
+
+bool tree_acts(const NODE* tree) {
+    return any_subtree(tree, [](const NODE* t) { return op_has_effect(t->op); });
+}
+
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
     return any_subtree(a, [lvalue](const NODE* t) { return node_may_modify(t, lvalue); });
 }
@@ -178,7 +205,7 @@ bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {
     if (tree_modifies_lvalue(a, lvalue)) return true;
     if (any_lvalue_read(a, [lvalue](const NODE* t) { return lvalues_may_be_aliased(t, lvalue); })) return true;
     return any_subtree(a, [lvalue](const NODE* t) {
-        return (op_is_call(t->op) || op_is_intrinsic(t->op) || t->op == MEMCPY) && call_may_read(t, lvalue);
+        return is_operation_on_memory(t->op) && call_may_read(t, lvalue);
     });
 }
 
@@ -198,6 +225,50 @@ bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t) {
     for (const LIST* s = bb->statements; s; s = s->rest)
         if (tree_modifies_lvalue_in_tree(s->first, t)) return true;
     return false;
+}
+
+// ---- What a tree reads
+
+// Without regard to the marks of arrays and structures: this is asked between passes that set marks.
+static bool is_exposed(const SYMTAB* sym) {
+    return sym->level == 0 || sym->is_aliased() || currfuninfo->address_taken_local;
+}
+
+READ_SET::READ_SET(const NODE* tree) {
+    for_each_subtree(tree, [this](const NODE* t) {
+        switch (t->op) {
+        case NAME:
+            if (!t->u.sym || t->u.sym->is_function()) break;
+            symbols.push_back(t->u.sym);
+            exposed |= is_exposed(t->u.sym);
+            break;
+        case UMULT:
+        case STREF: indirect = true; break;
+        case ASM:
+        case UAND: complete = false; break;
+        default: complete &= !is_operation_on_memory(t->op); break;
+        }
+    });
+}
+
+const SYMTAB* READ_SET::only_variable() const {
+    if (indirect || symbols.empty()) return nullptr;
+    const SYMTAB* first = symbols.front();
+    return std::all_of(symbols.begin(), symbols.end(), [first](const SYMTAB* s) { return s == first; }) ? first : nullptr;
+}
+
+bool READ_SET::may_be_changed(const WRITE& w) const {
+    if (!w.place) return w.by->op == ASM || indirect || exposed;
+    const NODE* name = name_of_place(w.place);
+    if (!name) return indirect || exposed;
+    if (std::find(symbols.begin(), symbols.end(), name->u.sym) != symbols.end()) return true;
+    return indirect && is_exposed(name->u.sym);
+}
+
+bool READ_SET::may_be_changed_by(const NODE* tree) const {
+    bool changes = false;
+    for_each_write(tree, [this, &changes](const WRITE& w) { changes = changes || may_be_changed(w); });
+    return changes;
 }
 
 // ---- Sets

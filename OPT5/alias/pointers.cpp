@@ -4,8 +4,8 @@
 // assignments to a NAME alone; a pointer that anything else may write is derived from the bottom, and points anywhere.
 #include "OPT5/alias/alias.h"
 
+#include "OPT5/alias/effects.h"
 #include "OPT5/alias/state.h"
-#include "OPT5/alias/walks.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -57,8 +57,7 @@ const NODE* pointer_basis(const NODE* p) {
 const NODE* address_expr_base(const NODE* pointer) {
     const NODE* base = pointer_basis(pointer);
     while (base && base->op == UAND) {
-        const NODE* object = base->left;
-        while (object->op == STDOT) object = object->left;
+        const NODE* object = without_members(static_cast<const NODE*>(base->left));
         if (object->op != UMULT && object->op != STREF) return object->op == NAME ? object : nullptr;
         base = pointer_basis(object->left);
     }
@@ -118,9 +117,7 @@ bool is_address_constant(const NODE* value) {
     const NODE* basis = pointer_basis(value);
     if (basis && basis->op == SCON) return true;
     if (!basis || basis->op != UAND) return false;
-    const NODE* object = basis->left;
-    while (object->op == STDOT) object = object->left;
-    return object->op == NAME;
+    return without_members(static_cast<const NODE*>(basis->left))->op == NAME;
 }
 
 PTR* initial_root(PTR* p, PTR* bottom) { return p == bottom || p->member || !is_tracked(p->symbol) ? bottom : nullptr; }

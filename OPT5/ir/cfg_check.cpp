@@ -3,6 +3,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
 #include "UTIL/abort.h"
 
 #include <cstdarg>
@@ -150,7 +151,7 @@ public:
     }
 
     void check_middle(const LIST* s, const BBLK* bb) {
-        if (s->rest && side_effects[s->first->op] == 2) complain(bb, s->first, "transfers control inside its block");
+        if (s->rest && op_transfers_control(s->first->op)) complain(bb, s->first, "transfers control inside its block");
     }
 
 private:

@@ -8,6 +8,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 
 #include <cstring>
 
@@ -220,7 +221,7 @@ bool trees_are_congruent(const NODE* a, const NODE* b, bool se_ok) {
     a = without_wrappers(a);
     b = without_wrappers(b);
     if (a == b) return trees_are_congruent(a, a, se_ok);
-    if (!se_ok && (side_effects[a->op] || side_effects[b->op])) return false;
+    if (!se_ok && (op_has_effect(a->op) || op_has_effect(b->op))) return false;
     if (!types_allow_congruence(a, b)) return false;
     if (a->op == b->op) {
         if (same_op_is_congruent(a, b, se_ok)) return true;

@@ -7,6 +7,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 
 #include <cstring>
 
@@ -65,7 +66,7 @@ bool tree_has_side_effects(const NODE* t) {
             }
             break;
         default:
-            if (side_effects[t->op] || tree_has_side_effects(t->right)) return true;
+            if (op_has_effect(t->op) || tree_has_side_effects(t->right)) return true;
         }
         t = t->left;
     }
@@ -99,7 +100,7 @@ bool expr_is_constant(const NODE* t) {
     case LABELREF:
     case FIELD: return false;
     default:
-        if (side_effects[t->op] || !t->left || t->op >= DFG_DEF) return false;
+        if (op_has_effect(t->op) || !t->left || t->op >= DFG_DEF) return false;
         return expr_is_constant(t->left) && (!t->right || expr_is_constant(t->right));
     }
 }
@@ -415,8 +416,13 @@ SYMTAB* pointee_name_if_known(const NODE* p) {
     return p->op == UAND ? object_name_if_known(p->left) : nullptr;
 }
 
+static bool is_part(int op) {
+    return op == STDOT || op == REAL || op == IMAG || op == VFIELD || op == VRCONV || op == SIMDHI || op == SIMDLO ||
+           op == DDNODE;
+}
+
 SYMTAB* object_name_if_known(const NODE* t) {
-    while (t && (is_transparent(t->op) || t->op == STDOT || (t->op >= SSA_USE && t->op <= SSA_CHI))) t = t->left;
+    while (t && (is_transparent(t->op) || is_part(t->op) || (t->op >= SSA_USE && t->op <= SSA_CHI))) t = t->left;
     if (!t) return nullptr;
     if (t->op == NAME) return t->u.sym;
     return t->op == STREF || (t->op == UMULT && !t->right) ? pointee_name_if_known(t->left) : nullptr;

@@ -6,6 +6,7 @@
 #include "OPT5/scalar/fcp.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"

@@ -10,6 +10,7 @@
 #include "OPT5/scalar/eda.h"
 
 #include "BITVEC/bitvec.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -95,8 +96,7 @@ public:
 private:
     // What an assignment without other effects reads is needed if its target is, all else at once.
     void statement(NODE* t) {
-        const bool assigns = t->op == ASG || t->op == PLUSPLUS || t->op == MINMIN || op_of_opASG[t->op] != ILLOP;
-        const int target = assigns && t->left->op == NAME ? live_index(t->left->u.sym) : -1;
+        const int target = live_index(assigned_variable(t));
         const bool is_pure = target >= 0 && !tree_has_side_effects(t->right) && !tree_is_arg_prolog(t);
         for_each_node(is_pure ? t->right : t, [&](const NODE* n) {
             const int bit = n->op == NAME ? live_index(n->u.sym) : -1;

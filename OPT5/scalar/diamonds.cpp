@@ -6,11 +6,11 @@
 
 #include "OPT5/scalar/simpcfg.h"
 
-#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/minmax.h"
 #include "OPT5/simp/simp.h"
 

@@ -14,7 +14,7 @@
 
 #include "OPT5/alias/address_form.h"
 #include "OPT5/alias/alias.h"
-#include "OPT5/alias/walks.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
@@ -86,7 +86,7 @@ NODE* subst_globals(NODE* tree, bool* changed) {
     }
     if (tree->left) {
         const bool left_is_place =
-            opcode_is_ASG(tree->op) || tree->op == UAND || tree->op == ARGREF || tree->op == STDOT;
+            writes_left_operand(tree->op) || tree->op == UAND || tree->op == ARGREF || tree->op == STDOT;
         if (left_is_place)
             subst_globals_in_address(tree->left, changed);
         else
@@ -98,7 +98,7 @@ NODE* subst_globals(NODE* tree, bool* changed) {
 
 // Of a place only what its address is computed from is read.
 void subst_globals_in_address(NODE* place, bool* changed) {
-    while (place->op == STDOT) place = place->left;
+    place = object_of_place(place);
     if (place->op == NAME) return;
     place->left = subst_globals(place->left, changed);
     place->right = subst_globals(place->right, changed);
@@ -117,9 +117,7 @@ namespace {
 
 bool is_object_address(const NODE* t) {
     if (t->op != UAND) return false;
-    const NODE* object = t->left;
-    while (object->op == STDOT) object = object->left;
-    return object->op == NAME;
+    return without_members(static_cast<const NODE*>(t->left))->op == NAME;
 }
 
 } // namespace
@@ -208,19 +206,19 @@ void SWEEP::count_tree(NODE* t) {
             ++counts[t->u.sym].uses;
             return;
         }
-        if (!writes_left_operand(t->op) || !t->left) {
-            count_tree(t->right);
-            continue;
-        }
         count_tree(t->right);
-        NODE* name = written_name(t->left);
-        if (!name) continue;
-        COUNTS& c = counts[name->u.sym];
-        ++c.definitions;
-        c.definition = t->op == ASG && t->left == name ? t : nullptr;
-        c.from_prolog = in_prolog;
-        c.at_entry = in_entry;
-        if (c.definition) return;
+        bool is_definition = false;
+        for_each_write_of_node(t, [&](const WRITE& w) {
+            const NODE* name = w.place ? name_of_place(w.place) : nullptr;
+            if (!name) return;
+            is_definition = t->op == ASG && t->left == name;
+            COUNTS& c = counts[name->u.sym];
+            ++c.definitions;
+            c.definition = is_definition ? t : nullptr;
+            c.from_prolog = in_prolog;
+            c.at_entry = in_entry;
+        });
+        if (is_definition) return; // which is no use
     }
 }
 

@@ -22,75 +22,6 @@ constexpr int MAX_BLOCKS_BACK = 8;
 constexpr size_t MAX_STATEMENTS_BACK = 24;
 constexpr int MAX_NODES = 32; // of a condition: larger ones are seldom repeated and dear to compare
 
-// ---- What a condition reads
-
-bool is_exposed(const SYMTAB* sym) { return sym->level == 0 || sym->is_aliased() || currfuninfo->address_taken_local; }
-
-} // namespace
-
-READS reads_of(NODE* condition) {
-    READS reads;
-    for_each_node(condition, [&](const NODE* t) {
-        switch (t->op) {
-        case NAME:
-            if (!t->u.sym || t->u.sym->is_function()) break;
-            reads.symbols.push_back(t->u.sym);
-            reads.exposed |= is_exposed(t->u.sym);
-            break;
-        case UMULT:
-        case STREF: reads.indirect = true; break;
-        case ICALL:
-        case UICALL:
-        case MCALL:
-        case UMCALL:
-        case CALL:
-        case UCALL:
-        case ASM:
-        case UAND: reads.supported = false; break;
-        default: break;
-        }
-    });
-    return reads;
-}
-
-namespace {
-
-bool names_one_of(const NODE* lvalue, const std::vector<const SYMTAB*>& symbols) {
-    return std::find(symbols.begin(), symbols.end(), lvalue->u.sym) != symbols.end();
-}
-
-bool store_may_change(const NODE* lvalue, const READS& reads) {
-    while (lvalue->op == STDOT) lvalue = lvalue->left;
-    if (lvalue->op != NAME) return reads.indirect || reads.exposed;
-    if (names_one_of(lvalue, reads.symbols)) return true;
-    return reads.indirect && is_exposed(lvalue->u.sym);
-}
-
-} // namespace
-
-bool statement_may_change(NODE* statement, const READS& reads) {
-    bool changes = false;
-    for_each_node(statement, [&](const NODE* t) {
-        switch (t->op) {
-        case CALL:
-        case UCALL:
-        case ICALL:
-        case UICALL:
-        case MEMCPY: changes |= reads.indirect || reads.exposed; break;
-        case MCALL:
-        case UMCALL: changes |= reads.indirect || reads.exposed; break;
-        case ASM: changes |= !tree_is_ASM_comment(t); break;
-        case ARGREF: changes |= store_may_change(t->left, reads); break;
-        default:
-            if (side_effects[t->op] == 1) changes |= store_may_change(t->left, reads);
-            break;
-        }
-    });
-    return changes;
-}
-
-namespace {
-
 // ---- Implication
 
 // A truth value without the operators that only pass it on or negate it.
@@ -266,13 +197,9 @@ LIST* TEST_OUTCOMES::control_of(const BBLK* bb) {
 bool TEST_OUTCOMES::ask_for(NODE* condition) {
     if (count_nodes_in_tree(condition) > MAX_NODES || tree_has_side_effects(condition)) return false;
     q = condition;
-    reads = reads_of(condition);
-    variable = nullptr;
-    if (!reads.indirect && !reads.symbols.empty() &&
-        std::all_of(reads.symbols.begin(), reads.symbols.end(),
-                    [this](const SYMTAB* sym) { return sym == reads.symbols.front(); }))
-        variable = reads.symbols.front();
-    return reads.supported;
+    reads = READ_SET(condition);
+    variable = reads.only_variable();
+    return reads.is_complete();
 }
 
 // The statements ahead of the control statement, the last first: all, or as many as are looked at.
@@ -290,13 +217,13 @@ const std::vector<const LIST*>& TEST_OUTCOMES::statements_back(const BBLK* bb) {
 bool TEST_OUTCOMES::may_change_between(const BBLK* test, const BBLK* last) {
     size_t budget = MAX_STATEMENTS_BACK;
     for (const BBLK* bb = last; bb != test; bb = bb->predecessors->first)
-        if (block_may_change(bb, &budget) || statement_may_change(control_of(bb)->first->left, reads)) return true;
+        if (block_may_change(bb, &budget) || reads.may_be_changed_by(control_of(bb)->first->left)) return true;
     return false;
 }
 
 bool TEST_OUTCOMES::block_may_change(const BBLK* bb, size_t* budget) {
     for (const LIST* s : statements_back(bb)) {
-        if (*budget == 0 || statement_may_change(s->first, reads)) return true;
+        if (*budget == 0 || reads.may_be_changed_by(s->first)) return true;
         --*budget;
     }
     return false;
@@ -305,7 +232,7 @@ bool TEST_OUTCOMES::block_may_change(const BBLK* bb, size_t* budget) {
 const LIST* TEST_OUTCOMES::first_that_may_change(const BBLK* bb) {
     size_t statements = 0;
     for (const LIST* s = bb->statements; s && s->rest; s = s->rest)
-        if (++statements > MAX_STATEMENTS_BACK || statement_may_change(s->first, reads)) return s;
+        if (++statements > MAX_STATEMENTS_BACK || reads.may_be_changed_by(s->first)) return s;
     return nullptr;
 }
 
@@ -313,13 +240,13 @@ const LIST* TEST_OUTCOMES::first_that_may_change(const BBLK* bb) {
 const NODE* TEST_OUTCOMES::constant_assignment(const BBLK* pred) {
     if (!variable) return nullptr;
     const NODE* control = control_of(pred)->first;
-    if (control->op != BRANCH && (control->op != IF || statement_may_change(control->left, reads))) return nullptr;
+    if (control->op != BRANCH && (control->op != IF || reads.may_be_changed_by(control->left))) return nullptr;
     const auto& back = statements_back(pred);
     const auto asg =
         std::find_if(back.begin(), back.end(), [this](const LIST* s) { return assigns_constant(s->first, variable); });
     if (asg == back.end()) return nullptr;
     const bool is_last =
-        std::none_of(back.begin(), asg, [this](const LIST* s) { return statement_may_change(s->first, reads); });
+        std::none_of(back.begin(), asg, [this](const LIST* s) { return reads.may_be_changed_by(s->first); });
     return is_last ? (*asg)->first : nullptr;
 }
 

@@ -1,6 +1,8 @@
 // Whether one condition decides another.
 #pragma once
 
+#include "OPT5/alias/effects.h"
+
 #include <optional>
 #include <vector>
 
@@ -13,15 +15,6 @@ struct LIST;
 // are evaluated on the same values. A NaN is no integer: floating conditions decide only themselves and their exact
 // opposite.
 int pred_implies_pred(const NODE* p, bool sense, const NODE* q);
-
-struct READS {
-    std::vector<const SYMTAB*> symbols;
-    bool indirect = false; // through pointers
-    bool exposed = false;  // a symbol that a pointer or a call may reach
-    bool supported = true;
-};
-READS reads_of(NODE* condition);
-bool statement_may_change(NODE* statement, const READS& reads);
 
 bool is_test(const NODE* control); // an IF on a value
 // A loop's test is left where it is: a way around it would enter the loop in its middle.
@@ -56,7 +49,7 @@ private:
 
     std::vector<LAST_STATEMENTS> blocks; // by depth-first number
     const NODE* q = nullptr;
-    READS reads;
+    READ_SET reads;
     const SYMTAB* variable = nullptr; // the only one that `q` reads
 };
 

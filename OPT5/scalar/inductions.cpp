@@ -1,8 +1,7 @@
 #include "OPT5/scalar/inductions.h"
 
 #include "BITVEC/bitvec.h"
-#include "OPT5/alias/alias.h"
-#include "OPT5/alias/walks.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -120,27 +119,28 @@ void LOOP_FACTS::enter_statement(BBLK* bb, NODE* t) {
     for_each_node(t, [this](const NODE* n) {
         if (n->op == NAME) ++names[n->u.sym];
     });
+    for_each_written_name(t, [this](const NODE* name, const NODE*) { ++assignments[name->u.sym]; });
     INDUCTION::STEP step{bb, t, 0, nullptr};
     if (is_step(t, &step)) {
         INDUCTION& induction = inductions[t->left->u.sym];
         induction.sym = t->left->u.sym;
         if (induction.steps.empty()) in_order.push_back(&induction);
         induction.steps.push_back(step);
-        ++assignments[induction.sym];
-        return;
-    }
-    if (t->op == ASG && t->left->op == NAME) definitions[t->left->u.sym] = {bb, t};
-    for_each_node(t, [this](const NODE* n) {
-        if (!n->left || !writes_left_operand(n->op)) return;
-        if (const NODE* name = written_name(n->left)) ++assignments[name->u.sym];
-    });
+    } else if (t->op == ASG && t->left->op == NAME)
+        definitions[t->left->u.sym] = {bb, t};
+}
+
+// The assignments of the whole loop are known by now, so that it can be told what an amount is made of.
+bool LOOP_FACTS::steps_by_invariants(const INDUCTION& i) {
+    if (assignments[i.sym] != static_cast<int>(i.steps.size())) return false;
+    return std::all_of(i.steps.begin(), i.steps.end(),
+                       [this](const INDUCTION::STEP& s) { return !s.amount || is_invariant(s.amount); });
 }
 
 void LOOP_FACTS::keep_inductions() {
-    in_order.erase(
-        std::remove_if(in_order.begin(), in_order.end(),
-                       [this](const INDUCTION* i) { return assignments[i->sym] != static_cast<int>(i->steps.size()); }),
-        in_order.end());
+    in_order.erase(std::remove_if(in_order.begin(), in_order.end(),
+                                  [this](const INDUCTION* i) { return !steps_by_invariants(*i); }),
+                   in_order.end());
     std::unordered_map<const SYMTAB*, INDUCTION> kept;
     std::vector<const SYMTAB*> symbols;
     for (INDUCTION* i : in_order) {
@@ -213,8 +213,7 @@ bool LOOP_FACTS::is_invariant(const NODE* t) {
         return is_unchanged(sym, t);
     }
     case UAND: {
-        const NODE* object = t->left;
-        while (object->op == STDOT) object = object->left;
+        const NODE* object = without_members(static_cast<const NODE*>(t->left));
         return object->op == NAME && object->u.sym && !object->u.sym->is_function();
     }
     case PLUS:
@@ -273,10 +272,8 @@ void LOOP_FACTS::find_starts() {
         for (LIST* s = bb->statements; s; s = s->rest) statements.push_back(s->first);
         for (auto it = statements.rbegin(); it != statements.rend(); ++it) {
             NODE* root = *it;
-            for_each_node(root, [&](const NODE* t) {
-                if (!t->left || !writes_left_operand(t->op)) return;
-                const NODE* name = written_name(t->left);
-                INDUCTION* i = name ? induction(name->u.sym) : nullptr;
+            for_each_written_name(root, [&](const NODE* name, const NODE* t) {
+                INDUCTION* i = induction(name->u.sym);
                 if (!i || !seen.emplace(i->sym, true).second) return;
                 if (t != root || t->op != ASG || t->left != name || t->right->op != ICON) return;
                 if (!i->sym->type->is_int() || !t->right->u.lval.fits<int32_t>()) return;

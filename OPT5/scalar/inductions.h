@@ -20,7 +20,7 @@ struct INDUCTION {
         BBLK* bb;
         NODE* statement;
         int64_t by;         // 1 or -1 with an amount
-        const NODE* amount; // a part of the statement; null for the constant alone
+        const NODE* amount; // invariant, a part of the statement; null for the constant alone
     };
     SYMTAB* sym;
     std::vector<STEP> steps;
@@ -69,7 +69,7 @@ public:
 private:
     void collect_assignments();
     void enter_statement(BBLK* bb, NODE* t);
-    void enter_assignments(const NODE* t, const NODE* step);
+    bool steps_by_invariants(const INDUCTION& i);
     void keep_inductions();
     void order_steps();
     void find_starts();

@@ -5,6 +5,7 @@
 // before its statement changes anything.
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"

@@ -7,7 +7,7 @@
 #include "OPT5/scalar/known_signs.h"
 
 #include "OPT5/alias/alias.h"
-#include "OPT5/alias/walks.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -32,11 +32,9 @@ bool may_have_sign_known(const SYMTAB* sym) {
 KNOWN_SIGNS::KNOWN_SIGNS() {
     std::vector<DEFINITION> definitions;
     for_each_tree(currfuninfo, [&](const NODE* tree) {
-        for_each_subtree(tree, [&](const NODE* t) {
-            if (!t->left || !writes_left_operand(t->op)) return;
-            const NODE* name = written_name(t->left);
-            if (!name || !may_have_sign_known(name->u.sym)) return;
-            definitions.push_back({name == t->left ? t : nullptr, name->u.sym});
+        for_each_written_name(tree, [&](const NODE* name, const NODE* by) {
+            if (!may_have_sign_known(name->u.sym)) return;
+            definitions.push_back({name == by->left ? by : nullptr, name->u.sym});
             nonnegative.insert(name->u.sym);
         });
     });

@@ -13,13 +13,13 @@
 // the pointer meets its last value exactly.
 #include "OPT5/scalar/merge.h"
 
-#include "OPT5/alias/walks.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/inductions.h"
 #include "OPT5/scalar/lowering.h"

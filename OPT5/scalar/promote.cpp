@@ -7,6 +7,7 @@
 #include "OPT5/scalar/eda.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -18,14 +19,13 @@
 
 namespace {
 
-bool is_assignment(int op) { return op == ASG || op == PLUSPLUS || op == MINMIN || op_of_opASG[op] != ILLOP; }
 bool is_control(int op) { return op == IF || op == SWITCH || op == RETURN; }
 
 // Whether there is anything to do below the root.
 bool has_embedded(NODE* t) {
     bool found = false;
     auto visit = [&](const NODE* n) {
-        if (is_assignment(n->op) || n->op == COMMAOP) found = true;
+        if (opcode_is_ASG(n->op) || n->op == COMMAOP) found = true;
     };
     for_each_node(t->left, visit);
     for_each_node(t->right, visit);
@@ -56,7 +56,7 @@ public:
         case QUEST: root->left = value(root->left); return; // the rest runs under a condition
         default: break;
         }
-        if (is_assignment(root->op)) {
+        if (opcode_is_ASG(root->op)) {
             root->left = address(root->left);
             evaluated.push_back(root->left);
             root->right = value(root->right);
@@ -105,9 +105,9 @@ private:
             return t;
         default: break;
         }
-        if (is_assignment(t->op)) return assignment(t);
+        if (opcode_is_ASG(t->op)) return assignment(t);
         operands(t);
-        if (side_effects[t->op]) blocked = true;
+        if (op_has_effect(t->op)) blocked = true;
         return t;
     }
 

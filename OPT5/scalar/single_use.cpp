@@ -5,7 +5,7 @@
 // only if that does nothing before it reads it. The read may stand under a condition: then less is computed.
 #include "OPT5/scalar/merge.h"
 
-#include "OPT5/alias/walks.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -78,9 +78,7 @@ private:
 
     // What is not a plain computation stays where it is.
     static bool is_kept(const NODE* t) {
-        return op_is_call(t->op) || t->op == MCALL || t->op == UMCALL || t->op == ICALL || t->op == UICALL ||
-               t->op == NASSERT || t->op == ASSERT || t->op == DDNODE || t->op == CSE_ORIG || t->op == CSE_DUPE ||
-               side_effects[t->op] != 0;
+        return op_has_effect(t->op) || op_is_intrinsic(t->op) || t->op == CSE_ORIG || t->op == CSE_DUPE;
     }
 
     bool reads_variables_alone(const NODE* value) {
@@ -95,35 +93,22 @@ private:
     // Whether `statement` may change a variable of the value. The target of its root is written last.
     static bool assigns_part(const NODE* statement, const NODE* value, bool with_root) {
         bool assigns = false;
-        for_each_subtree(statement, [&](const NODE* t) {
-            if (assigns || !t->left || (side_effects[t->op] != 1 && t->op != ARASG) || (t == statement && !with_root))
-                return;
-            const NODE* target = t->left;
-            while (target->left && target->op != UMULT && target->op != STREF) target = target->left;
-            assigns = target->op == NAME && sym_appears_in_tree(target->u.sym, value);
+        for_each_written_name(statement, [&](const NODE* name, const NODE* by) {
+            assigns = assigns || ((by != statement || with_root) && sym_appears_in_tree(name->u.sym, value));
         });
         return assigns;
     }
 
     // A statement that computes, and then stores or branches.
     static bool acts_last(const NODE* statement) {
-        if (tree_is_EH_SWITCH(statement)) return false;
-        auto acts = [](const NODE* t) {
-            return op_is_call(t->op) || t->op == MCALL || t->op == UMCALL || t->op == MEMCPY ||
-                   side_effects[t->op] != 0;
-        };
-        const bool left = statement->left && tree_contains_matching_node(statement->left, acts);
-        const bool right = statement->right && tree_contains_matching_node(statement->right, acts);
-        return !left && !right;
+        return !tree_is_EH_SWITCH(statement) && !tree_acts(statement->left) && !tree_acts(statement->right);
     }
 
     NODE** read_of(NODE** place, const SYMTAB* sym) {
         NODE* t = *place;
         if (!t) return nullptr;
         if (t->op == NAME) return t->u.sym == sym ? place : nullptr;
-        const bool writes =
-            side_effects[t->op] == 1 || t->op == ARASG || t->op == UAND || t->op == ARGREF || t->op == STDOT;
-        if (!(writes && t->left && t->left->op == NAME))
+        if (!left_names_variable(t))
             if (NODE** found = read_of(&t->left, sym)) return found;
         return read_of(&t->right, sym);
     }

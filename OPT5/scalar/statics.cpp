@@ -7,6 +7,7 @@
 #include "OPT5/scalar/eda.h"
 
 #include "BITVEC/bitvec.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -81,9 +82,11 @@ private:
     // Everything but the read or the assignment of the whole variable.
     void drop_what_is_not_plain(const NODE* t) {
         for (; t; t = t->left) {
-            const bool by_parts = t->op == UAND || t->op == ARGREF || t->op == STDOT || t->op == VFIELD ||
-                                  t->op == SIMDHI || t->op == SIMDLO || t->op == VRCONV;
-            if (by_parts) drop(bit(t->left));
+            if (t->op == UAND || t->op == ARGREF) drop(bit(t->left));
+            for_each_write_of_node(t, [this, t](const WRITE& w) {
+                const NODE* name = w.place ? name_of_place(w.place) : nullptr;
+                if (name && name != t->left) drop(bit(name));
+            });
             if (t->op == ASM && t->text) drop_what_text_names(t->text);
             drop_what_is_not_plain(t->right);
         }

@@ -8,6 +8,7 @@
 #include "OPT5/scalar/simpcfg.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -23,11 +24,8 @@ register_option pass_disable_superblock_opt("disable:superblock_opt");
 
 namespace {
 
-// A change of a value behind its back: the root of the statement is looked at apart.
-void collect_written(NODE* t, std::unordered_set<const SYMTAB*>& written) {
-    for_each_node(t, [&](const NODE* n) {
-        if (side_effects[n->op] == 1 && n->left && n->left->op == NAME) written.insert(n->left->u.sym);
-    });
+void collect_written(const NODE* t, std::unordered_set<const SYMTAB*>& written) {
+    for_each_written_name(t, [&](const NODE* name, const NODE*) { written.insert(name->u.sym); });
 }
 
 class PROPAGATION {
@@ -52,8 +50,8 @@ private:
         }
         // What an assignment below the root writes is neither the old nor the new value throughout the statement.
         std::unordered_set<const SYMTAB*> written;
-        if (t->left) collect_written(t->left, written);
-        if (t->right) collect_written(t->right, written);
+        collect_written(t->left, written);
+        collect_written(t->right, written);
         for (const SYMTAB* sym : written) forget(sym);
         bool changed = false;
         if (!values.empty()) {
@@ -76,12 +74,9 @@ private:
         case IF:
         case SWITCH: t->left = t->left->op == ENDLOOP ? t->left : read(t->left, changed); return t;
         case RETURN: t->right = read(t->right, changed); return t;
-        case STDOT: // an object's member keeps its object
-            if (t->left->op != NAME) t->left = read(t->left, changed);
-            return t;
         default: break;
         }
-        if (!(side_effects[t->op] == 1 && t->left->op == NAME)) t->left = read(t->left, changed);
+        if (!left_names_variable(t)) t->left = read(t->left, changed);
         t->right = read(t->right, changed);
         return t;
     }
@@ -112,7 +107,7 @@ private:
         }
     }
 
-    void forget_written(NODE* t) {
+    void forget_written(const NODE* t) {
         std::unordered_set<const SYMTAB*> written;
         collect_written(t, written);
         for (const SYMTAB* sym : written) forget(sym);

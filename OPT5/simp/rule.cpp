@@ -1,5 +1,6 @@
 // Questions about shapes, and replacements, that the rules of the simplifier share.
 
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/rule.h"
 
 #include "OPT5/simp/simp.h"
@@ -32,7 +33,7 @@ bool is_pure_within(const NODE* t, int* budget) {
             continue;
         case ICALL: return !tree_contains_op(t->left, ARGREF) && !tree_has_side_effects(t);
         default:
-            if (side_effects[t->op]) return false;
+            if (op_has_effect(t->op)) return false;
         }
         if (t->right && !is_pure_within(t->right, budget)) return false;
         t = t->left;

@@ -11,6 +11,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
@@ -73,7 +74,7 @@ private:
 
     // What transfers control, or stands for itself, is simplified and kept; of anything else the effects are.
     void plain(NODE* t) {
-        const bool keeps = side_effects[t->op] == 2 || t->op == PPRAGMA || t->op == ASM || tree_is_arg_prolog(t);
+        const bool keeps = op_transfers_control(t->op) || t->op == PPRAGMA || t->op == ASM || tree_is_arg_prolog(t);
         if (!is_simplified) t = simp_tree(t, nullptr);
         is_simplified = false;
         if (t && !keeps && is_small_constant_STASG(t)) {
@@ -278,7 +279,7 @@ void seq_trees(NODE* (*prepare)(NODE*)) {
         if (out == before) continue;
         if (is_call_that_never_returns(out->first))
             end_flow_behind(&out, psn);
-        else if (catches && side_effects[out->first->op] != 2 && statement_may_reach_catch(out->first))
+        else if (catches && !op_transfers_control(out->first->op) && statement_may_reach_catch(out->first))
             dispatch_behind(out->first, &out, psn);
     }
     f->statements = out;

@@ -161,9 +161,32 @@ long promised(int n) {
     return s;
 }
 
+// No induction steps by what the loop changes, and nothing is evaluated for a step but where it stands.
+long next[300], growing = 1;
+volatile int one_of_three = 3;
+int asked;
+int ask(int i) {
+    asked++;
+    return (i & 3) + 1;
+}
+// FUNCTION: changing_steps
+// COUNT 1: _ask(
+long changing_steps(int n) {
+    long r = 1;
+    int k = 1, j = 0;
+    for (int i = 0; i < n; i += k) w[i] = i, k++;
+    for (int i = 0; i < n; i += next[i]) r = r * 5 + w[i];
+    for (int i = 0; i < n; i += ask(i)) r = r * 5 + w[i];
+    for (int i = 0; i < n; i += growing) r = r * 5 + w[i], growing = growing * 2;
+    for (int i = 0; i < n; i += one_of_three) r = r * 5 + w[i];
+    for (int i = 0; i < n; i += (j++, 1)) r = r * 5 + w[i] + w[j];
+    for (int i = 0; i < n; i += (k = k & 3) + 1) r = r * 5 + w[i] + w[k], k += i;
+    return r + asked;
+}
+
 int main(void) {
     for (int i = 0; i < 300; i++) a[i] = i ^ 5, b[i] = 300 - i;
-    for (int i = 0; i < 64; i++) w[i] = i * 7L, m[i / 8][i % 8] = i;
+    for (int i = 0; i < 64; i++) w[i] = i * 7L, next[i] = i % 3 + 1, m[i / 8][i % 8] = i;
     put_i16(dot(a, b, 30));
     put_i16(dot(a, b, 0));
     put_i16(dot(a, b, -3));
@@ -178,5 +201,6 @@ int main(void) {
     put_i32(w[29] + w[7] * 3 + w[12] + a[8] +  pairs[39].x + pairs[3].y);
     put_i16(found(203));
     put_i32(wraps(3, w, 1) + bounded(9) + kept_volatile(9) + kept_aliased(9) + promised(4));
+    put_i32(changing_steps(60));
     return 0;
 }

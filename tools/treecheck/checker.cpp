@@ -2,6 +2,7 @@
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
 
@@ -256,7 +257,7 @@ struct LOOP* SURROUNDINGS::loop() const {
     loop_seams.is_constant_in = [](const NODE* t, const struct LOOP* loop) {
         bool varies = false;
         for_each_node(const_cast<NODE*>(t), [&](const NODE* n) {
-            varies = varies || side_effects[n->op] ||
+            varies = varies || op_has_effect(n->op) ||
                      (n->op == NAME ? behind(loop).varying.count(n->u.sym) != 0
                                     : n->op == UMULT || n->op == STDOT || n->op == STREF);
         });

@@ -4,6 +4,7 @@
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 
 namespace treecheck {
 
@@ -95,7 +96,7 @@ SIZE size_of(const NODE* t) {
     SIZE s;
     for_each_node(const_cast<NODE*>(t), [&](const NODE* n) {
         ++s.nodes;
-        s.effects += side_effects[n->op] != 0;
+        s.effects += op_has_effect(n->op);
         if (n->op == ICON)
             s.constants += n->u.lval.is_negative() ? 1.0 + static_cast<double>((-n->u.lval).value)
                                                    : static_cast<double>(n->u.lval.value);

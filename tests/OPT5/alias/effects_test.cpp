@@ -3,6 +3,7 @@
 #include "alias_fixture.h"
 
 #include "BITVEC/bitvec.h"
+#include "OPT5/alias/effects.h"
 
 namespace {
 

@@ -1,0 +1,127 @@
+// What evaluating a tree reads and changes: the one answer for every pass.
+//
+// Questions with "may" are answered true where that cannot be decided. They rely on the marks of `init_aliasing_info`:
+// without those every object can be reached. A variable that only its NAME reaches (`only_its_name_reaches`) is changed
+// by what `for_each_written_name` visits and by nothing else.
+#pragma once
+
+#include "OPT5/ir/walks.h"
+
+#include <vector>
+
+class BBLK;
+class BITVEC;
+class SYMTAB;
+struct LS;
+
+// ---- Writes
+
+struct WRITE {
+    const NODE* by;    // the operator
+    const NODE* place; // null: what pointers reach, or the object of a pointer that is not known
+};
+
+// Whether the node itself acts on what pointers reach: calls, copies of memory, assembly. Its operands are not looked
+// at; a call that promises to write nothing counts as none.
+bool may_write_indirectly(const NODE* node);
+// The place that the pointer of a copy points to, where the tree shows it, or null.
+const NODE* place_of_pointer(const NODE* pointer);
+
+namespace effects {
+template <class F>
+void visit_places(const NODE* by, const NODE* place, const F& visit) {
+    const NODE* object = object_of_place(place);
+    if (object->op == QUEST && object->right) { // one of two
+        visit_places(by, object->right->left, visit);
+        visit_places(by, object->right->right, visit);
+    } else
+        visit(WRITE{by, place});
+}
+} // namespace effects
+
+// What one node writes, its operands aside.
+template <class F>
+void for_each_write_of_node(const NODE* t, const F& visit) {
+    if (t->op == ARGREF) // the callee of a machine call gets it to write to
+        effects::visit_places(t, t->left, visit);
+    else if (t->op == MEMCPY)
+        visit(WRITE{t, place_of_pointer(arg_list_lookup(t->left, 0))});
+    else if (writes_left_operand(t->op) && t->left)
+        effects::visit_places(t, t->left, visit);
+    else if (may_write_indirectly(t))
+        visit(WRITE{t, nullptr});
+}
+
+// Whatever evaluating `tree` may write, nested assignments included.
+template <class F>
+void for_each_write(const NODE* tree, const F& visit) {
+    for_each_subtree(tree, [&visit](const NODE* t) { for_each_write_of_node(t, visit); });
+}
+
+// The NAMEs that are written, wholly or in part: `visit(name, by)`.
+template <class F>
+void for_each_written_name(const NODE* tree, const F& visit) {
+    for_each_write(tree, [&visit](const WRITE& w) {
+        if (const NODE* name = w.place ? name_of_place(w.place) : nullptr) visit(name, w.by);
+    });
+}
+
+// Whether the node's left operand is a place with a variable in it, not a value to be computed: nothing may take the
+// variable's place there.
+inline bool left_names_variable(const NODE* t) {
+    if (!t->left || !(writes_left_operand(t->op) || t->op == UAND || t->op == ARGREF || t->op == STDOT)) return false;
+    bool names = false;
+    effects::visit_places(t, t->left, [&names](const WRITE& w) { names = names || name_of_place(w.place); });
+    return names;
+}
+
+// The variable that an assignment operator, the root of `t`, writes as a whole; null for another place or operator.
+SYMTAB* assigned_variable(const NODE* t);
+// Whether evaluating `tree` does anything but compute a value; reading a volatile object is no act here.
+bool tree_acts(const NODE* tree);
+
+// ---- Changes
+
+// Whether evaluating `a` may change what `t` reads: the objects, and the addresses it reads them by.
+bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t);
+bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t);
+// Whether evaluating `a` may write to, or may read or write, the object of `lvalue`.
+bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue);
+bool tree_touches_lvalue(const NODE* a, const NODE* lvalue);
+
+// What a tree reads, summed up, for a tree about which many others are asked. Coarser than the alias rules: one access
+// through a pointer may meet any object that is reached by pointers.
+class READ_SET {
+public:
+    READ_SET() = default;
+    explicit READ_SET(const NODE* tree);
+    // False if it reads what the tree does not show: a call or assembly stands in it.
+    bool is_complete() const { return complete; }
+    bool may_be_changed_by(const NODE* tree) const;
+    const SYMTAB* only_variable() const; // the one that all reads are of, or null
+
+private:
+    bool may_be_changed(const WRITE& w) const;
+
+    std::vector<const SYMTAB*> symbols;
+    bool indirect = false; // through pointers
+    bool exposed = false;  // a symbol that a pointer or a call may reach
+    bool complete = true;
+};
+
+// ---- Calls
+// What a call does outside its own frame: to the object of `lvalue`, which may be null for "anything at all".
+bool call_may_modify(const NODE* call, const NODE* lvalue);
+bool call_may_read(const NODE* call, const NODE* lvalue);
+bool call_assigns_thru_byref_args(const NODE* call);
+bool byref_arg_is_not_assigned_thru(int index, SYMTAB* callee); // argument from 0; null: unknown
+
+// ---- Sets
+// The lvalues that a pass keeps facts on, numbered by their place; a set of `kill_aliases_*` has a bit for each. Trees
+// other than lvalues are killed with what they read. The trees must stand until `clean_up_alias_analysis_bitvecs_etc`.
+void compute_alias_sets(const std::vector<const NODE*>& lvalues);
+void kill_aliases_of_lvalue(const NODE* lvalue, BITVEC* set);
+// What an access of unknown address changes, in `scope` if that is not null; `tree` is the access or null.
+void kill_aliases_indirect(const LS* scope, const NODE* tree, BITVEC* set, unsigned flags = 0);
+void kill_aliases_on_call(const NODE* call, BITVEC* set);
+void kill_assertions(BITVEC* set);

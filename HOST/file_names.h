@@ -16,3 +16,7 @@ std::string debug_file_name(const std::string& name, const char* suffix);
 // Whether both names lead to one existing regular file, by whatever links.
 bool is_same_file(const std::string& a, const std::string& b);
 bool is_regular_file(const std::string& name);
+// Whether what is printed on the standard output goes to this file or pipe.
+bool is_standard_output(const std::string& name);
+// Where the name leads when all its links are followed; the name itself if it leads nowhere.
+std::string real_file_name(const std::string& name);

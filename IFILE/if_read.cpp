@@ -67,7 +67,20 @@ int I_FILE::if_read_record() {
     return kind;
 }
 
+// What a back-end function holds is the code generator's, though its records may be of kinds that mean something
+// elsewhere: its symbols are none of the unit's, its texts none of the file's.
+namespace {
+bool is_for_back_end(int kind) {
+    return kind == IFR_SYMBOL || kind == IFR_PRAGMA || kind == IFR_COMMENT || kind == IFR_ASM || kind == IFR_LOOP_VAR ||
+           kind == IFR_LDSPEC;
+}
+} // namespace
+
 void I_FILE::read_record(int kind) {
+    if (in_back_end_function && is_for_back_end(kind)) {
+        cursor = limit;
+        return;
+    }
     switch (kind) {
     case IFR_BEGIN_FUNC: return if_read_begin_func();
     case IFR_END_FUNC: return if_read_end_func();

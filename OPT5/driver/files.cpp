@@ -12,6 +12,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <unistd.h>
 
 namespace {
 
@@ -19,6 +20,7 @@ register_option pass_debug_help("debug:help");
 
 std::string info_name, debug_name;
 FILE* output_stream = nullptr; // until the I_FILE takes it over
+std::string real_output_name;  // the file itself, should the name be a link to it
 
 // `format` takes the reason and the name.
 [[noreturn]] void cannot_open(const char* format, const std::string& name) {
@@ -76,6 +78,8 @@ void open_info_file() {
     info_name = given ? given : replace_extension(i_file_name, ".nfo");
     refuse_same_file(info_name, i_file_name, "input");
     refuse_same_file(info_name, o_file_name, "output");
+    if (file_options->getnumarg(option_obj::OO_print_debug) > 0)
+        refuse_same_file(info_name, debug_file_name(i_file_name, nullptr), "debug");
     finfo = std::fopen(info_name.c_str(), "w");
     if (!finfo) cannot_open("\n>> Cannot Open Info File, %s : %s, Aborting\n", info_name);
     print_toolversion(finfo);
@@ -86,6 +90,10 @@ void open_output() {
     refuse_same_file(o_file_name, debug_name, "debug");
     output_stream = std::fopen(o_file_name.c_str(), "wb");
     if (!output_stream) cannot_open("\n>> Cannot Open Output icode File, %s : %s, Aborting\n", o_file_name);
+    real_output_name = real_file_name(o_file_name);
+    // What the run prints must not stand in the I-file.
+    std::fflush(stdout);
+    if (is_standard_output(o_file_name)) dup2(STDERR_FILENO, STDOUT_FILENO);
     o_file = I_FILE::if_create(output_stream, tp, i_file->source_name.c_str());
     for (const OPTION_SET& set : icode_optionlist) o_file->if_enter_option_set(set);
 }
@@ -136,7 +144,9 @@ void open_debug_file(int fatal, const char* suffix, const char* mode) {
     if (!suffix && fdebug) return;
     const std::string name = debug_file_name(i_file_name, suffix);
     if (fdebug) debug_printf(">>>> SWITCHING LOG TO %s\n", name.c_str());
-    const bool overwrites = is_same_file(name, i_file_name) || name == o_file_name || is_same_file(name, o_file_name);
+    bool overwrites = false;
+    for (const std::string& other : {i_file_name, o_file_name, info_name})
+        overwrites |= !other.empty() && (name == other || is_same_file(name, other));
     if (overwrites) errno = EEXIST;
     FILE* const stream = overwrites ? nullptr : std::fopen(name.c_str(), mode ? mode : "w");
     if (!stream) {
@@ -152,14 +162,23 @@ void close_debug_stream() {
     fdebug = nullptr;
 }
 
+namespace {
+
+// The output is not whole. A link to it stays, and other names of the file find it empty; a device or a pipe is not ours.
+void remove_output() {
+    if (!is_regular_file(real_output_name)) return;
+    if (truncate(real_output_name.c_str(), 0) == 0) std::remove(real_output_name.c_str());
+}
+
+} // namespace
+
 void discard_output() {
     if (!o_file && !output_stream) return;
     if (o_file) I_FILE::if_close(o_file, true, true);
     if (i_file) I_FILE::if_close(i_file, true, false);
     o_file = i_file = nullptr;
     output_stream = nullptr;
-    // A device or a pipe is not ours to remove.
-    if (is_regular_file(o_file_name)) std::remove(o_file_name.c_str());
+    remove_output();
 }
 
 void fail_run(const std::string& text) {
@@ -196,7 +215,7 @@ void close_files() {
     const bool info_good = finish_text_file(finfo, "\n== END OF INFO OUTPUT==\n");
     if (!output_failed && debug_good && info_good) return;
     const std::string& name = output_failed ? o_file_name : debug_good ? info_name : debug_name;
-    if (is_regular_file(o_file_name)) std::remove(o_file_name.c_str());
+    remove_output();
     std::fprintf(stderr, "zopt: %s: cannot write: %s\n", name.c_str(), std::strerror(reason ? reason : EIO));
     std::exit(1);
 }

@@ -30,7 +30,14 @@ void note_function_symbol(SYMTAB* sym) {
     FUNINFO* f = make_FUNINFO(sym);
     f->symbol = sym;
     const bool open = sym->retention == I_SYMTAB::RETENTION_BY_USE && sym->sclass != SC_STATIC && !no_outside_callers;
-    if (sym->retention == I_SYMTAB::RETENTION_KEEP || open) set_flags(f, FUN_is_referenced);
+    if (open) set_flags(f, FUN_is_referenced);
+}
+
+// What is kept is so for somebody outside: he may call the function, or read, write and point to the object.
+void open_to_outside(SYMTAB* sym) {
+    if (sym->retention != I_SYMTAB::RETENTION_KEEP) return;
+    sym->cqual |= CQ_TOP;
+    if (sym->is_function()) set_flags(make_FUNINFO(sym), FUN_is_referenced);
 }
 
 } // namespace
@@ -57,7 +64,6 @@ I_SYMTAB* OPT_CLIENT::cl_symbol_create(const char* name, TYPE* type, TYPE* secon
     sym->retention = retention;
     sym->level = lex;
     sym->written_as_parameter = lex == 1;
-    if (retention == I_SYMTAB::RETENTION_KEEP) sym->cqual |= CQ_TOP;
     if (!file_level) {
         sym->order_of_reading = next_depnum++;
         sym->set_depnum(sym->order_of_reading);
@@ -92,6 +98,7 @@ I_SYMTAB* OPT_CLIENT::cl_symbol_create(const char* name, TYPE* type, TYPE* secon
 
 void OPT_CLIENT::cl_symbol_def(I_SYMTAB* isym) {
     auto* sym = static_cast<SYMTAB*>(isym);
+    open_to_outside(sym); // its pragmas are known now, and they may say that it is kept
     make_symbol_groupable(sym);
     if (sym->is_function()) check_fun_for_byref_asgs(sym);
 }
@@ -107,7 +114,7 @@ void OPT_CLIENT::cl_symbol_init(I_SYMTAB* isym, std::vector<BASE_NODE*>& list) {
     for (NODE* item : *sym->autoinit)
         if (item->op != ENDINIT) scan_for_funinfo(item);
     const bool fixed = !(sym->cqual & (CQ_ALIASED | CQ_WRITTEN)) && sym->type->is_scalar() && sym->autoinit->size() == 2;
-    if (fixed && expr_is_constant(sym->autoinit->front())) sym->init_value = copy_tree(sym->autoinit->front());
+    if (fixed && initial_value_may_be_taken(sym) && expr_is_constant(sym->autoinit->front())) sym->init_value = copy_tree(sym->autoinit->front());
 }
 
 void OPT_CLIENT::cl_merge_type_defs() {

@@ -53,6 +53,24 @@ void close_promises(const std::vector<FUNINFO*>& list) {
     }
 }
 
+// A function that its symbol makes a synonym is the other one to the linker, which so stands behind every call of it,
+// whatever its own body calls. One without a body may be called from anywhere.
+void add_synonym_edges() {
+    for (SYMTAB* s = global_symbols; s; s = s->next) {
+        if (!s->is_function()) continue;
+        FUNINFO* f = make_FUNINFO(s);
+        for (const PRAGMA* p = s->pragma; p; p = p->next) {
+            if (p->kind != PRG_FUNC_SYNONYM || p->args.empty()) continue;
+            FUNINFO* target = make_FUNINFO(skip_name_prefix(p->args[0].c_str()));
+            if (!function_is_defined(target)) continue;
+            if (function_is_defined(f))
+                add_call_edge(f, target, false);
+            else
+                set_flags(target, FUN_is_cg_root);
+        }
+    }
+}
+
 // A call through a pointer may reach every function whose address is known.
 void add_anonymous_edges(const std::vector<FUNINFO*>& list) {
     for (FUNINFO* f : list) {
@@ -194,6 +212,7 @@ void set_up_and_build_call_graph() {
     if (!program.funlist) return;
     sort_by_name();
     const std::vector<FUNINFO*> list = defined_functions();
+    add_synonym_edges();
     close_promises(list);
     add_anonymous_edges(list);
     for (FUNINFO* f : list) classify_callees(f);

@@ -76,7 +76,7 @@ void rescan_uses() {
         for (NODE* item : *s->autoinit)
             if (item->op != ENDINIT) rescan_symbol_uses(item);
         const bool one_value = s->autoinit->size() == 2 && s->type->is_scalar(); // the value and the end
-        if (!s->init_value && one_value && expr_is_constant(s->autoinit->front()))
+        if (!s->init_value && one_value && initial_value_may_be_taken(s) && expr_is_constant(s->autoinit->front()))
             s->init_value = copy_tree(s->autoinit->front());
     }
     if (program.assembly.empty()) return;
@@ -111,16 +111,15 @@ void analyze_symbol(SYMTAB* s) {
     if (!is_data_definition(s)) return;
     if (s->type->is_volatile() || s->dynamic_init) s->cqual |= ALL_USES;
     if (!is_only_read(s)) return;
+    if (!initial_value_may_be_taken(s)) {
+        forget_value(s);
+        return;
+    }
     if (!s->init_value) {
         if (s->sclass == SC_STATIC || no_outside_writers) {
             s->cqual |= CQ_ALIASED;
             info_printf("\nVariable has no explicitly assigned value:\n\t%s\n", s->name);
         }
-        return;
-    }
-    // What the linker may replace or place elsewhere has the value only if nothing may write it.
-    if (symbol_has_pragma(s, PRG_WEAK) || symbol_has_pragma(s, PRG_DATA_SECTION)) {
-        if (!symbol_is_immutable(s)) forget_value(s);
         return;
     }
     make_constant(s);

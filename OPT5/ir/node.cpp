@@ -130,7 +130,8 @@ void NODE::mk_name(I_SYMTAB* sym) {
 void NODE::mk_field(int kind, fkMDATA* member, TYPE* csu) {
     if (kind != 1) abort_optimizer();
     mval = member;
-    u.csu = csu;
+    u.csu = csu->real; // the structure that has the member, not a qualified or named form of it
+    while (u.csu->equiv) u.csu = u.csu->equiv;
     if (member && member->is_bitfld && currfuninfo) currfuninfo->has_bitfield_access = true;
     if (!type) return;
     std::lock_guard<std::recursive_mutex> guard(mk_ptr_lock);

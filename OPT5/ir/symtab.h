@@ -173,6 +173,10 @@ PRAGMA* find_pragma(const SYMTAB* sym, int kind);   // first of that kind, or nu
 void remove_pragma(int kind, PRAGMA** list);        // unlinks and frees the first of that kind
 bool is_struct_explosion_parm_assignment(const NODE* a, const NODE* b);
 TYPE* guess_cpp_type(const NODE* tree);
+// Whether an object holds at the start of the run what its initializer says: not if the program computes it then, if
+// another definition may take its place, or if it can change and is placed by hand, where the loader may set it up
+// otherwise. Who asks must know besides that nothing has written it since.
+bool initial_value_may_be_taken(const SYMTAB* sym);
 // The known initial value that an lvalue or a place in a symbol has at the start of the run, as a fresh tree, or null.
 NODE* lookup_autoinit(const NODE* tree);
 NODE* lookup_autoinit(const SYMTAB* sym, uint64_t offset_bits, TYPE* type);

@@ -106,12 +106,15 @@ private:
     NODE* found = nullptr;
 };
 
-constexpr int PRG_MAY_BE_REPLACED = PRG_WEAK;
-
 } // namespace
 
+bool initial_value_may_be_taken(const SYMTAB* sym) {
+    if (sym->dynamic_init || find_pragma(sym, PRG_WEAK)) return false;
+    return symbol_is_immutable(sym) || !find_pragma(sym, PRG_DATA_SECTION);
+}
+
 NODE* lookup_autoinit(const SYMTAB* sym, uint64_t offset_bits, TYPE* type) {
-    if (!sym || !sym->autoinit || find_pragma(sym, PRG_MAY_BE_REPLACED)) return nullptr;
+    if (!sym || !sym->autoinit || !initial_value_may_be_taken(sym)) return nullptr;
     return INIT_WALK(*sym->autoinit, offset_bits, type).run(sym->orig_type ? sym->orig_type : sym->type);
 }
 

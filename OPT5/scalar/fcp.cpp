@@ -38,7 +38,7 @@ bool is_plain_scalar(const TYPE* t) {
 
 bool keeps_its_initial_value(const SYMTAB* sym) {
     if (!is_plain_scalar(sym->type) || (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF)) return false;
-    if (sym->dynamic_init || find_pragma(sym, PRG_WEAK)) return false;
+    if (!initial_value_may_be_taken(sym)) return false;
     if (symbol_is_immutable(sym)) return true;
     constexpr unsigned USES = CQ_REFERENCED | CQ_WRITTEN | CQ_ALIASED;
     return file_symbols_are_known && (sym->cqual & USES) == CQ_REFERENCED;
@@ -54,7 +54,7 @@ NODE* initial_value_of_name(const NODE* name) {
 NODE* initial_content(const NODE* access) {
     const SYMTAB* sym = object_name_if_known(access);
     if (!sym || sym->level != 0 || (sym->sclass != SC_STATIC && sym->sclass != SC_EXTDEF)) return nullptr;
-    if (!sym->autoinit || sym->dynamic_init || !sym->type->is_const() || lvalue_is_volatile(access)) return nullptr;
+    if (!sym->autoinit || !sym->type->is_const() || lvalue_is_volatile(access)) return nullptr;
     if (!is_plain_scalar(access->type)) return nullptr;
     const ADDRESS_FORM place = address_form(access);
     if (place.object != sym || !place.terms.empty() || place.offset.is_negative()) return nullptr;

@@ -186,9 +186,11 @@ TEST(records, of_back_ends_are_passed_over) {
     WORLD world;
     FILE_BUILDER file;
     file.body = rec(IFR_IR_BEGIN, by({1, 2, 0xFF, 3}) + no_psn) + rec(IFR_IR, no_psn + "whatever this is") +
-                rec(IFR_IR_END, no_psn) + FILE_BUILDER::function("");
+                rec(IFR_SYMBOL, "a symbol") + rec(IFR_PRAGMA, by({52, 0})) + rec(IFR_COMMENT, str("text")) +
+                rec(IFR_ASM, str("text") + no_psn) + rec(IFR_IR_END, no_psn) + FILE_BUILDER::function("");
     world.read(file.build());
     EXPECT_EQ(world.unit.items.size(), 4u);
+    EXPECT_EQ(world.unit.globals.size(), 2u);
     EXPECT_EQ(world.unit.file()->level, 0);
 }
 

@@ -13,6 +13,18 @@ int* where = &variable;
 static const int grid[2][3] = {{1, 2, 3}, {4, 5, 6}};
 extern const int elsewhere;
 
+#pragma DATA_SECTION(placed, ".other")
+static int placed = 5;
+#pragma DATA_SECTION(placed_constant, ".other")
+static const int placed_constant = 6;
+#pragma RETAIN(kept)
+static int kept = 7;
+
+// What the loader or somebody outside may have set otherwise is read.
+// FUNCTION: set_elsewhere
+// HAS: return _kept * 16 + _placed + 6
+int set_elsewhere(void) { return placed + kept * 16 + placed_constant; }
+
 static int setting = 30, counted = 1, exposed = 2;
 
 // Nothing in the file writes it.
@@ -78,6 +90,7 @@ int main(void) {
     *where = 9;
     *expose() = 40;
     count();
+    put_i16(set_elsewhere());
     put_i16(never_written(3));
     put_i16(written_elsewhere());
     changing[1] = 3;

@@ -33,6 +33,8 @@ TEST(CommandLine, WrongOnes) {
         {{"a.if", "./link.if"}, 1, "would overwrite the input file"},
         {{"-o3", "-n1", "--opt_info_filename=a.if", "a.if", "b.if"}, 1, "would overwrite the input file"},
         {{"-o3", "-n1", "--opt_info_filename=b.if", "a.if", "b.if"}, 1, "b.if: would overwrite the output file"},
+        {{"-#1", "-o3", "--opt_info_filename=a.odb", "a.if", "b.if"}, 1, "a.odb: would overwrite the debug file"},
+        {{"-#1", "-o3", "--opt_info_filename=./a.odb", "a.if", "b.if"}, 1, "Cannot Open Debug File, File exists"},
         {{"-#1", "a.if", "a.odb"}, 1, "\n>> Cannot Open Debug File, File exists : a.odb, Aborting\n"},
         {{"text.if", "b.if"}, 1, "\n>> Error when opening input icode file : text.if, Aborting\n"},
     };
@@ -150,6 +152,28 @@ TEST(Files, BadInputLeavesNoOutput) {
         ASSERT_FALSE(contains(r.err, "ENTIRE error message")) << "cut after " << size << "\n" << r.err;
         ASSERT_FALSE(w.has("b.if")) << "cut after " << size;
     }
+}
+
+TEST(Files, OutputUnderOtherNames) {
+    WORKPLACE w;
+    w.put("a.if", unit());
+    std::string bad = unit();
+    bad.replace(bad.find("e\x02$"), 3, "e\x02\xC8"); // no such operator
+    w.put("bad.if", bad);
+    ASSERT_EQ(symlink("target.if", (w.dir + "/sym.if").c_str()), 0);
+    ASSERT_EQ(w.run({"a.if", "sym.if"}).status, 0);
+    EXPECT_EQ(w.run({"target.if", "b.if"}).status, 0);
+    ASSERT_EQ(link((w.dir + "/target.if").c_str(), (w.dir + "/hard.if").c_str()), 0);
+    EXPECT_EQ(w.run({"bad.if", "sym.if"}).status, 1);
+    EXPECT_FALSE(w.has("target.if"));
+    EXPECT_EQ(w.get("hard.if"), "") << "no half of an output";
+    w.put("target.if", "");
+    EXPECT_TRUE(w.has("sym.if")) << "the link is not ours";
+    const RESULT r = w.run({"a.if", "/dev/stdout"});
+    EXPECT_EQ(r.status, 0);
+    w.put("out.if", r.out);
+    EXPECT_EQ(w.run({"out.if", "b.if"}).status, 0) << "nothing that the run prints stands in it";
+    EXPECT_TRUE(contains(r.err, "Pass 2")) << r.err;
 }
 
 TEST(Files, DebugNameIsCut) {

@@ -92,6 +92,30 @@ TEST_F(ProgramTest, WhatNothingCallsIsNotCompiledUnlessItsAddressIsKnown) {
         EXPECT_EQ(count(out_text, f), 1) << f << "\n" << out_text;
 }
 
+// A pragma of the symbol says as well as the symbol's record that somebody outside needs it; a synonym needs its target.
+TEST_F(ProgramTest, WhatPragmasKeepIsCompiled) {
+    constexpr int EXT_CALLED = 23, IS_REFERENCED = 52, SYNONYM = 78;
+    IC_SYMBOL* idle = declare("_idle", 2);
+    IC_SYMBOL* target = declare("_target");
+    std::vector<IC_SYMBOL*> kept = {pragma(declare("_called"), EXT_CALLED), pragma(declare("_referenced"), IS_REFERENCED),
+                                    pragma(declare("_outer", 2), IS_REFERENCED),
+                                    pragma(declare("_other_name"), SYNONYM, {"target"})};
+    pragma(kept.back(), IS_REFERENCED);
+    IC_SYMBOL* object = pragma(initialized("_object", 3, 7), IS_REFERENCED);
+    returns(idle, icon(1));
+    returns(target, icon(1));
+    for (IC_SYMBOL* f : kept) returns(f, icon(1));
+    begin_main();
+    ret(name(object));
+    end();
+    info({"--opt_level=3", "--call_assumptions=2"});
+    const std::string text = dump();
+    EXPECT_EQ(count(text, "function _idle"), 0) << text;
+    for (const char* f : {"_called", "_referenced", "_outer", "_other_name", "_target", "_main"})
+        EXPECT_EQ(count(text, std::string("function ") + f), 1) << f << "\n" << text;
+    EXPECT_EQ(count(text, "return _object"), 1) << text;
+}
+
 TEST_F(ProgramTest, CallersComeBeforeWhatTheyCall) {
     IC_SYMBOL* third = declare("_a_third");
     IC_SYMBOL* second = declare("_b_second");

@@ -167,7 +167,8 @@ TEST_F(AutoinitTest, StructuresInLayoutOrderAndNothingBehindAUnion) {
     EXPECT_EQ(value_at(s, 64, tp->int_t), 2);
     EXPECT_EQ(value_at(s, 96, tp->long_t), 80000);
     NODE* field = new_node(FIELD, tp->long_t);
-    field->mk_field(1, pair->mdata()->next, pair);
+    field->mk_field(1, pair->mdata()->next, tp->mk_qual(pair, QUAL_CONST));
+    EXPECT_EQ(field->field_csu(), pair) << "who reads the file looks for the member in the structure itself";
     NODE* object_ref = mk_NAME(s);
     object_ref->type = pair;
     NODE* tree = maketree(STDOT, object_ref, field, tp->long_t);

@@ -22,13 +22,14 @@ bool is_scaling(const NODE* t) {
            equiv_mtypes(t->type, t->left->type) && equiv_mtypes(t->type, type_for_PMCONV(t->left->type));
 }
 
-// The terms of an offset.
+// The terms of an offset. A size may need a wider type than the index, whose scale in units fits.
 void scale_terms(NODE* t) {
     if (t->op == PLUS || t->op == MINUS) {
         scale_terms(t->left);
         scale_terms(t->right);
     } else if (is_scaling(t)) {
-        NODE* bits = mk_ICON(t->right->u.lval * INT65(ADDRESS_UNIT), t->type);
+        const INT65 size = t->right->u.lval * INT65(ADDRESS_UNIT);
+        NODE* bits = mk_ICON(size, truncate_to_type(size, t->type) == size ? t->type : tp->long_t);
         erase_tree(t->right);
         t->right = bits;
         t->op = PMCONV;

@@ -73,7 +73,7 @@ NODE* simp_float_MULT(NODE* t, struct LOOP* loop) {
         erase_tree(t->right);
         return simp_node(to_unary(t, UMINUS, t->left), loop);
     }
-    if (is_fcon(t->right, two) && is_pure(t->left)) {
+    if (is_fcon(t->right, two) && !t->left->left && is_pure(t->left)) { // nothing is computed twice
         erase_tree(t->right);
         return simp_node(to_binary(t, PLUS, t->left, copy_tree(t->left)), loop);
     }

@@ -16,6 +16,7 @@ struct unit {
 static int rows[3][5] = {{1, 2, 3, 4, 5}, {10, 20, 30, 40, 50}, {-1, -2, -3, -4, -5}};
 static int* const lines[4] = {rows[0], rows[2], rows[1] + 1, &rows[0][4]};
 static struct unit device;
+static int wide[3][2080]; // a row has more bits than an int counts
 
 static int pick(int* const* table, int i, int j) { return table[i][j]; }
 
@@ -64,6 +65,8 @@ static int window(const int* middle, int radius) {
     return s;
 }
 
+static int far(int i, int j) { return wide[i][j] + wide[i - 1][j + 1]; }
+
 int main(void) {
     int *p = rows[1], i, j;
     for (i = 0; i < 4; i++) put_i16(pick(lines, i, i == 3 ? -2 : 1));
@@ -94,5 +97,9 @@ int main(void) {
     put_i16(*maximum(rows[1], 5));
     put_i16(window(rows[0] + 2, 2));
     put_i16(window(rows[0] + 2, 0));
+    for (i = 0; i < 3; i++)
+        for (j = 0; j < 2080; j += 7) wide[i][j] = i * 1000 + j;
+    put_i16(far(2, 6));
+    put_i16(far(1, 2072));
     return 0;
 }

@@ -8,6 +8,8 @@ optimized once more: an output is a valid input, and must still print the same.
 A program may begin with comments that say how it is built:
   // parse: WORD...      words for the parser; a file name with .c is a further file of the unit, in this folder
   // optimize: WORD...   every level is taken with these words too; such a line may be repeated
+
+With --forms SEED each program is judged once a level as another parser might have written it (forms.py).
 """
 import argparse
 import sys
@@ -50,10 +52,10 @@ def variants(levels, more=()):
             yield f"level {level} {' '.join(words)}", [f"--opt_level={level}", *words, CHECK]
 
 
-def judge_variant(tools, unit, want, name, words):
+def judge_variant(tools, unit, want, name, words, rounds=("", " again")):
     """Failures of one program optimized by `words`, twice in a row. `unit` stays as it is."""
     source = unit
-    for round_ in ("", " again"):
+    for round_ in rounds:
         out = unit.with_name(f"{unit.stem}-{name.replace(' ', '-')}{round_.replace(' ', '-')}.if")
         try:
             tools.optimize(source, out, words)
@@ -66,7 +68,7 @@ def judge_variant(tools, unit, want, name, words):
     return []
 
 
-def judge_program(tools, source, levels, folder):
+def judge_program(tools, source, levels, folder, forms=None):
     """All failures of one program, each a line of text; none when it passes."""
     expected = source.with_suffix(".expected")
     if not expected.exists():
@@ -74,13 +76,18 @@ def judge_program(tools, source, levels, folder):
     want = Outcome(0, expected.read_text())
     unit = Path(folder) / f"{source.stem}.if"
     try:
-        tools.parse(source, unit, parser_words(source))
+        words = [] if forms is None else ["--seed", f"{forms} {source.stem}"]
+        tools.parse(source, unit, parser_words(source) + words)
         found = difference(want, tools.execute(unit))
     except Trouble as trouble:
         found = str(trouble)
     if found:
         return [f"unoptimized: {found}"]
     failures = []
+    if forms is not None:
+        for level in levels:
+            failures += judge_variant(tools, unit, want, f"level {level}", [f"--opt_level={level}", CHECK], [""])
+        return failures
     for name, words in variants(levels, directives(source, "optimize")):
         failures += judge_variant(tools, unit, want, name, words)
     return failures
@@ -100,14 +107,17 @@ def main():
     parser.add_argument("--only", action="append", metavar="NAME", help="programs whose name contains NAME; repeatable")
     parser.add_argument("--levels", default=" ".join(LEVELS), help="levels to optimize at (all)")
     parser.add_argument("--shard", default="0/1", metavar="INDEX/COUNT", help="a part of the programs, from 0/COUNT on")
+    parser.add_argument("--forms", metavar="SEED", help="programs in other forms, at each level")
     options = parser.parse_args()
+    if options.forms is not None:
+        options.icparse = HERE / "forms.py"
     tools, levels = Tools.of(options), options.levels.replace(",", " ").split()
     programs = chosen(options.only, options.shard)
     if not programs:
         sys.exit("no program is chosen")
     failed = 0
     with tempfile.TemporaryDirectory() as folder, ThreadPoolExecutor(options.jobs) as pool:
-        results = pool.map(lambda source: judge_program(tools, source, levels, folder), programs)
+        results = pool.map(lambda source: judge_program(tools, source, levels, folder, options.forms), programs)
         for source, failures in zip(programs, results):
             failed += bool(failures)
             for failure in failures:

@@ -44,8 +44,8 @@ def take_option_words(arguments, parser):
     return rest, sets
 
 
-def translate(options):
-    """The bytes of the I-file."""
+def translate(options, rewrite=None):
+    """The bytes of the I-file, once `rewrite` has had the unit."""
     T.set_abi(options.abi == "eabi")
     unit, linked = Unit(os.path.basename(options.files[0])), {}
     unit.option_sets = options.sets
@@ -56,14 +56,16 @@ def translate(options):
         tree = preprocess.parse(path, options.include, options.define, options.abi == "eabi")
         Translator(unit, linked, None if options.quiet else sys.stderr).file(tree)
     finish(unit)
+    if rewrite:
+        rewrite(unit)
     return Writer(unit).bytes()
 
 
-def main(arguments):
+def main(arguments, rewrite=None):
     options = parse_arguments(arguments)
     sys.setrecursionlimit(20000)
     try:
-        data = translate(options)
+        data = translate(options, rewrite)
     except CompileError as error:
         if os.path.isfile(options.output):
             os.remove(options.output)

@@ -35,7 +35,10 @@ void register_option::set_state(const std::map<std::string, int>& state) {
 }
 
 void register_option::reset_state() {
-    for (const auto& entry : objects()) *entry.second = 0;
+    for (const auto& entry : objects()) {
+        *entry.second = 0;
+        entry.second->text_m.clear();
+    }
 }
 
 void register_option::dump() {}
@@ -52,6 +55,7 @@ void process_debug_option(const char* kind, const char* list) {
         if (prefix.size() + name.size() >= NAME_LIMIT) continue;
         register_option* object = register_option::get_option(prefix + name);
         if (!object) continue;
-        *object = equals == std::string::npos ? 1 : static_cast<int>(std::strtol(text.c_str() + equals + 1, nullptr, 0));
+        object->text_m = equals == std::string::npos ? "" : text.substr(equals + 1);
+        *object = equals == std::string::npos ? 1 : static_cast<int>(std::strtol(object->text_m.c_str(), nullptr, 0));
     }
 }

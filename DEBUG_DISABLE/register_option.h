@@ -18,6 +18,8 @@ public:
         return *this;
     }
     const std::string& name() const { return name_m; }
+    const std::string& text() const { return text_m; } // the value as it was written; empty without one
+
 
     static std::map<std::string, register_option*>& objects();
     static register_option* get_option(const std::string& name); // null if there is none
@@ -27,7 +29,8 @@ public:
     static void dump();        // prints nothing
 
 private:
-    std::string name_m;
+    friend void process_debug_option(const char* kind, const char* list);
+    std::string name_m, text_m;
     int value = 0;
 };
 

@@ -33,6 +33,13 @@ void emit_cmd_line_text(int argc, char** argv);
 void set_global_flags(option_obj* options);
 void init_fileopts();
 
+// ---- Reading and writing (reading.cpp, writing.cpp)
+class READ_LISTENER;
+READ_LISTENER& pass_listener(); // lets the passes hear of what is read
+// The last step of every function: prepares it for the code generator, writes its records and frees its body. A function
+// that is suppressed leaves no records.
+void output_function();
+
 // ---- The function loop (run_loop.cpp)
 void run_functions(void (*write_function)()); // `write_function`: the action of the last step
 void report_times(long ticks);

@@ -39,7 +39,7 @@ void open_input() {
     FILE* const stream = std::fopen(i_file_name.c_str(), "rb");
     if (!stream) cannot_open("\n>> Cannot Open Input icode File, %s : %s, Aborting\n", i_file_name);
     std::string why;
-    i_file = I_FILE::if_open(stream, opt_client(), &why);
+    i_file = I_FILE::if_open(stream, opt_client(pass_listener()), &why);
     if (i_file) return;
     std::fprintf(stderr, "\n>> Error when opening input icode file : %s, Aborting\n", i_file_name.c_str());
     if (!why.empty()) std::fprintf(stderr, "zopt: %s: %s\n", i_file_name.c_str(), why.c_str());

@@ -47,7 +47,6 @@ bool optimize_unit(int argc, char** argv) {
     init_fileopts();
     init_BIF_descriptors();
     init_simplifier();
-    init_live_variables();
     init_allocation_seam();
     setup_passes(true);
     if (pass_debug_parser) {

@@ -2,8 +2,6 @@
 #include "OPT5/driver/passes.h"
 
 #include "OPT5/driver/driver.h"
-#include "OPT5/ir/bblk.h"
-#include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "UTIL/abort.h"
 
@@ -17,57 +15,12 @@ pass_manager global_pass_manager;
 std::vector<pass*> normal_order, permuted_order;
 
 namespace {
-
-register_option pass_debug_skip_pass("debug:skip_pass"), pass_debug_list_passes("debug:list_passes"),
-    pass_debug_validate("debug:validate");
-
-bool current_function_has_blocks() { return currfuninfo && currfuninfo->bb_list; }
-
-void print_current_function() {
-    if (current_function_has_blocks() && fdebug) prbbinfix(fdebug);
-}
-
-void validate_current_function(const pass& step) {
-    if (!current_function_has_blocks()) return;
-    const int errors = validate_cfg() + validate_stmts();
-    if (errors == 0) return;
-    const std::string text =
-        "step " + std::to_string(step.serial) + " '" + step.name + "' left " + std::to_string(errors) + " errors";
-    abort_optimizer(text.c_str());
-}
-
+register_option pass_debug_skip_pass("debug:skip_pass"), pass_debug_list_passes("debug:list_passes");
 } // namespace
 
 void pass::run() {
-    if (pass_debug_skip_pass > 0 && static_cast<unsigned>(pass_debug_skip_pass) == serial) {
-        if (print_debug) {
-            debug_printf("\n\n\t\t\t---------- SKIPPING step %d '%s' ----------\n", static_cast<int>(serial),
-                         name.c_str());
-            debug_flush();
-        }
-        return;
-    }
-    if (print_debug) {
-        debug_printf("\n\n\t\t\t---------- ENTERING step %d '%s' ----------\n", static_cast<int>(serial), name.c_str());
-        debug_flush();
-        print_current_function();
-    }
-    const bool timed = print_debug || enable_time_stats;
-    const clock_t start = timed ? std::clock() : 0;
-    FUNINFO* const funinfo = currfuninfo; // the last step leaves no current function
-    action();
-    if (timed) {
-        const clock_t ticks = std::clock() - start;
-        if (print_debug) debug_printf("(%.1f sec for pass.)\n", static_cast<double>(ticks) / CLOCKS_PER_SEC);
-        if (funinfo) funinfo->time += ticks;
-    }
-    if (print_debug) {
-        debug_printf("\n\n\n\t\t\t---------- EXITING step %d '%s' ----------\n", static_cast<int>(serial),
-                     name.c_str());
-        debug_flush();
-        print_current_function();
-    }
-    if (pass_debug_validate) validate_current_function(*this);
+    const bool skip = pass_debug_skip_pass > 0 && static_cast<unsigned>(pass_debug_skip_pass) == serial;
+    run_row(row, "step " + std::to_string(serial), skip);
 }
 
 // ---- Orders
@@ -145,9 +98,10 @@ void setup_passes(bool use_forced) {
     normal_order.clear();
     permuted_order.clear();
     add_normal_order_passes(normal_order);
-    if (use_forced)
+    if (use_forced) {
+        check_row_switches();
         choose_order();
-    else
+    } else
         permuted_order = normal_order;
     if (pass_debug_list_passes && fdebug) list_passes(fdebug);
 }

@@ -1,6 +1,7 @@
-// The steps that every function goes through, and the order they run in.
+// The numbered steps that every function goes through, and the order they run in.
 #pragma once
 
+#include "OPT5/driver/pipeline.h"
 #include "OPT5/ir/serial_object.h"
 
 #include <cstdio>
@@ -11,15 +12,15 @@ class pass;
 class pass_manager : public serial_namespace<pass, pass_manager> {};
 extern pass_manager global_pass_manager;
 
-// A step. The test under which its work happens stands at the head of its action, so that a step is always entered,
-// dumped and timed.
+// A step. A step whose condition does not hold is entered, dumped and timed all the same.
 class pass : public serial_object<pass, pass_manager> {
 public:
+    const ROW row;
     const std::string name;
-    void (*const action)();
 
+    explicit pass(const ROW& step) : serial_object(&global_pass_manager), row(step), name(step.name) {}
     pass(const char* step_name, void (*step_action)())
-        : serial_object(&global_pass_manager), name(step_name), action(step_action) {}
+        : pass(ROW{ROW::FUNCTION, step_name, nullptr, nullptr, step_action, fact::none, fact::none}) {}
     virtual ~pass() = default;
     virtual bool is_barrier() const { return false; }
     void run();
@@ -39,6 +40,6 @@ extern std::vector<pass*> permuted_order; // the order that is run
 void setup_passes(bool use_forced);
 void list_passes(FILE* out);
 
-// The tables: all steps but "output function" in order, and of them those that work on loops (28 to 60).
+// The table: all steps but "output function" in order, and of them those that work on loops (28 to 60).
 void add_normal_order_passes(std::vector<pass*>& order);
 void add_dd_normal_order_passes(std::vector<pass*>& order);

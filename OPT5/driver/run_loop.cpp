@@ -71,6 +71,7 @@ void run_until_barrier(SYMTAB* sym, PASS_LIST& passes) {
     if (at_barrier_or_end(passes)) return;
     currfuninfo = make_FUNINFO(sym);
     currfunc = sym;
+    changed(fact::none); // what is known of globals was found for another function
     const FUNCTION_LOG log(sym);
     if (currfunc != currfuninfo->symbol) currfunc = get_sym_def_for_decl(currfuninfo->symbol);
     OPT_ASSERT(currfunc == currfuninfo->symbol);

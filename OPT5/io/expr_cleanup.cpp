@@ -6,7 +6,6 @@
 
 #include "OPT5/io/read.h"
 
-#include "OPT5/cd/vectors.h"
 #include "OPT5/io/read_client.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -141,8 +140,8 @@ NODE* cleanup_node(NODE* t) {
     case MCALL:
     case UMCALL: return cleanup_intrinsic(t);
     case REAL:
-    case IMAG: return t->left->type->is_vector() ? disguise_VFIELD_node(part_to_VFIELD(t)) : t;
-    case VFIELD: return disguise_VFIELD_node(t);
+    case IMAG: return t->left->type->is_vector() ? read_listener->lane_access(part_to_VFIELD(t)) : t;
+    case VFIELD: return read_listener->lane_access(t);
     default: return t;
     }
 }

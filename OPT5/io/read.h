@@ -9,7 +9,21 @@
 #include "OPT5/ir/node.h"
 #include "OPT5/ir/symtab.h"
 
-IF_CLIENT* opt_client(); // the one object, owned by the room
+// What is told of the input while it is read, to the passes that wait for it.
+class READ_LISTENER {
+public:
+    virtual ~READ_LISTENER() = default;
+    virtual void symbol_is_complete(SYMTAB* sym) = 0; // with its pragmas
+    virtual void initializer_item(NODE* item) = 0;    // of a file-scope symbol, cleaned up
+    virtual void assembly(const char* text) = 0;      // at file scope
+    virtual NODE* lane_access(NODE* access) = 0;      // a VFIELD; consumes it and returns what stands for it
+    virtual void arguments_are_complete() = 0;        // of the current function
+    // The current function has its symbols, and its statements in FUNINFO::statements, last first.
+    virtual void function_is_complete() = 0;
+};
+
+// The one object, owned by the room; `listener` is borrowed for the time of reading.
+IF_CLIENT* opt_client(READ_LISTENER& listener);
 
 extern SYMTAB* mcall_implicit_state_symbol; // the object that stands for the state that machine operations share
 extern NODE* mcall_implicit_state_tree;     // reads it through a pointer; shared, copy it

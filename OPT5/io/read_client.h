@@ -70,9 +70,9 @@ private:
     int64_t next_depnum = 0;
 };
 
-// Refuse a tree of a shape that no statement, or no item of an initializer, has.
-void check_statement(const NODE* tree);
-void check_initializer_item(const NODE* tree);
-
 // Ends reading with what is wrong with the input, at the reader's position.
 [[noreturn]] void refuse_input(const std::string& text);
+// The same for a fault of a tree; nothing where there is none.
+void refuse_if_faulty(const std::string& fault);
+
+extern READ_LISTENER* read_listener; // never null while records are read

@@ -2,23 +2,15 @@
 
 #include "OPT5/io/read_client.h"
 
-#include "BITVEC/bitvec.h"
 #include "IFILE/ifile.h"
 #include "OPT5/io/write.h"
-#include "OPT5/ipa/ipcp.h"
-#include "OPT5/ipa/progana.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/grammar.h"
+#include "OPT5/ir/profile.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/mvp/mvp.h"
-#include "OPT5/scalar/eda.h"
-#include "OPT5/scalar/fcp.h"
-#include "OPT5/scalar/lowering.h"
-#include "OPT5/scalar/profile.h"
-#include "OPT5/scalar/simpcfg.h"
-#include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
@@ -35,14 +27,21 @@ namespace {
 constexpr uint16_t IS_SIMPLIFIED = 1;
 } // namespace
 
-IF_CLIENT* opt_client() {
+READ_LISTENER* read_listener = nullptr;
+
+IF_CLIENT* opt_client(READ_LISTENER& listener) {
     static OPT_CLIENT client;
+    read_listener = &listener;
     return &client;
 }
 
 void refuse_input(const std::string& text) {
     const std::string where = currfunc ? std::string("function ") + currfunc->name + ": " : std::string();
     throw if_error(where + text, static_cast<long>(i_file ? i_file->if_tell() : 0));
+}
+
+void refuse_if_faulty(const std::string& fault) {
+    if (!fault.empty()) refuse_input(fault);
 }
 
 // A node without a type number is of no type to the optimizer, which asks every node for one.
@@ -62,7 +61,7 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
     if (!base) return;
     auto* tree = static_cast<NODE*>(base);
     if (lex == 0) refuse_input("a statement stands outside a function");
-    check_statement(tree);
+    refuse_if_faulty(grammar_fault_of_statement(tree));
     note_references(tree);
     // What the head of a counted loop evaluates stays as a statement ahead of the loop's label.
     if (tree->op == LOOP && tree->left && tree_has_side_effects(tree->left)) {
@@ -111,7 +110,7 @@ void OPT_CLIENT::cl_label(uint32_t label) {
 
 void OPT_CLIENT::cl_inline_asm(const char* text, PSN* psn) {
     if (lex == 0) {
-        program.assembly.push_back(text);
+        read_listener->assembly(text);
         wrasmr(IFR_ASM, text, psn);
     } else
         append(mk_ASM(IFR_ASM, text), psn);
@@ -170,10 +169,7 @@ void OPT_CLIENT::cl_end_args(PSN* psn) {
     if (lex != 1) refuse_input("the end of the arguments is out of place");
     currfuninfo->end_args_psn = psn;
     output_index = 0;
-    if (do_beta_MVP)
-        beta_parms_using_mvp_ip();
-    else
-        beta_parms();
+    read_listener->arguments_are_complete();
     make_ptr_entries(nullptr);
     ++lex;
     open_scopes.push_back({psn, currfuninfo->new_syms});
@@ -216,7 +212,7 @@ bool OPT_CLIENT::cl_func_eht(EHT_ENTRY* entries, uint32_t count) {
         item.kind = e.kind;
         item.next_entry = e.next;
         if (e.cleanup) {
-            check_statement(static_cast<NODE*>(e.cleanup));
+            refuse_if_faulty(grammar_fault_of_statement(static_cast<NODE*>(e.cleanup)));
             note_references(static_cast<NODE*>(e.cleanup));
             item.cleanup = expr_cleanup(static_cast<NODE*>(e.cleanup));
             LS::initialize_scopes_and_ptrs_from_tree(item.cleanup);
@@ -271,13 +267,6 @@ void simplify_raw_statements(FUNINFO* f) {
         if (f->has_intrinsics)
             s->first = rewrite_tree(s->first, [](NODE* t) { return op_is_intrinsic(t->op) ? fix_BIF_types(t) : t; });
         s->first = simp_tree(s->first, nullptr);
-    }
-}
-
-void size_site_sets(FUNINFO* f) {
-    for (BITVEC** sites : {&f->inline_sites, &f->forced_sites, &f->deep_sites}) {
-        delete *sites;
-        *sites = new BITVEC(f->unique_call_index + 1);
     }
 }
 
@@ -349,18 +338,6 @@ void OPT_CLIENT::cl_end_func(PSN* psn) {
     lex = 0;
     restate_intrinsics(f);
     simplify_raw_statements(f);
-    check_for_synonym_function_in_pass_1();
-    check_integrable_definition();
     add_return_pointer_assertion();
-    seq_trees(opt_level() >= 2 ? propagate_global_constants : nullptr);
-    buildcfg();
-    remove_tail_recursion();
-    simpcfg(0, 0);
-    fast_CP(4, 1);
-    preprocess_fundef(f);
-    size_site_sets(f);
-    init_ipcp_for_fun();
-    if (do_IP_MVP) init_IP_MVP_for_current_function();
-    identify_fl_statics_safe_for_auto();
-    convert_safe_fl_statics_to_auto(f);
+    read_listener->function_is_complete();
 }

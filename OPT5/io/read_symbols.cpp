@@ -4,9 +4,9 @@
 
 #include "IFILE/ifile.h"
 #include "OPT5/io/write.h"
-#include "OPT5/ipa/progana.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/grammar.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/target/target.h"
@@ -99,8 +99,7 @@ I_SYMTAB* OPT_CLIENT::cl_symbol_create(const char* name, TYPE* type, TYPE* secon
 void OPT_CLIENT::cl_symbol_def(I_SYMTAB* isym) {
     auto* sym = static_cast<SYMTAB*>(isym);
     open_to_outside(sym); // its pragmas are known now, and they may say that it is kept
-    make_symbol_groupable(sym);
-    if (sym->is_function()) check_fun_for_byref_asgs(sym);
+    read_listener->symbol_is_complete(sym);
 }
 
 void OPT_CLIENT::cl_symbol_init(I_SYMTAB* isym, std::vector<BASE_NODE*>& list) {
@@ -108,11 +107,11 @@ void OPT_CLIENT::cl_symbol_init(I_SYMTAB* isym, std::vector<BASE_NODE*>& list) {
     if (sym->autoinit) refuse_input("symbol " + std::string(sym->name) + " is initialized twice");
     sym->autoinit = new std::vector<NODE*>;
     for (BASE_NODE* item : list) {
-        check_initializer_item(static_cast<NODE*>(item));
+        refuse_if_faulty(grammar_fault_of_initializer_item(static_cast<NODE*>(item)));
         sym->autoinit->push_back(expr_cleanup(static_cast<NODE*>(item)));
     }
     for (NODE* item : *sym->autoinit)
-        if (item->op != ENDINIT) scan_for_funinfo(item);
+        if (item->op != ENDINIT) read_listener->initializer_item(item);
     const bool fixed = !(sym->cqual & (CQ_ALIASED | CQ_WRITTEN)) && sym->type->is_scalar() && sym->autoinit->size() == 2;
     if (fixed && initial_value_may_be_taken(sym) && expr_is_constant(sym->autoinit->front())) sym->init_value = copy_tree(sym->autoinit->front());
 }

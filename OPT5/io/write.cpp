@@ -3,19 +3,12 @@
 #include "OPT5/io/write.h"
 
 #include "IFILE/ifile.h"
-#include "OPT5/cd/vectors.h"
-#include "OPT5/dd/dd.h"
 #include "OPT5/io/read.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/mvp/mvp.h"
-#include "OPT5/scalar/eda.h"
-#include "OPT5/scalar/fcp.h"
-#include "OPT5/scalar/lowering.h"
-#include "OPT5/scalar/simpcfg.h"
 #include "OPT5/target/target.h"
 #include "UTIL/abort.h"
 
@@ -185,8 +178,6 @@ void write_func_body() {
         debug_printf("%s is a leaf function\n", f->name.c_str());
     }
     write_register_assignments();
-    finalize_ldspec_advice();
-    prune_exception_table();
     wrbblocks();
     write_exception_table(f);
     wrstcr(IFR_END_FUNC, f->end_psn);
@@ -228,8 +219,10 @@ void survey(FUNINFO* f) {
     for (EHT_ITEM& item : f->eht) for_each_node(item.cleanup, visit);
 }
 
-// Locals that nothing names any more are not declared to the code generator.
-void drop_unused_locals(FUNINFO* f) {
+} // namespace
+
+void drop_unused_locals() {
+    FUNINFO* f = currfuninfo;
     survey(f);
     for (SYMTAB** list : {&f->scalar_syms, &f->memory_syms, &f->new_syms, &f->pending_syms})
         for (SYMTAB** link = list; *link;) {
@@ -243,6 +236,8 @@ void drop_unused_locals(FUNINFO* f) {
             f->dropped_syms.push_back(s);
         }
 }
+
+namespace {
 
 // The operand that stood for the state of the machine while the function was optimized.
 NODE* strip_implicit_state(NODE* t) {
@@ -260,42 +255,19 @@ NODE* strip_implicit_state(NODE* t) {
     return t;
 }
 
-void strip_implicit_states(FUNINFO* f) {
+} // namespace
+
+void strip_implicit_states() {
+    FUNINFO* f = currfuninfo;
     if (!f->has_intrinsics) return;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
         for (LIST* s = bb->statements; s; s = s->rest) s->first = rewrite_tree(s->first, strip_implicit_state);
     for (EHT_ITEM& item : f->eht) item.cleanup = rewrite_tree(item.cleanup, strip_implicit_state);
 }
 
-} // namespace
-
-void output_function() {
-    FUNINFO* f = currfuninfo;
-    drop_unused_locals(f);
-    combine_asgs_to_memory();
-    optimize_SWITCH_cases();
-    init_reg_defs();
-    allocate_regs();
-    elim_dead_assigns(0, 0);
-    if (!TEST_FLAG(f, FUN_is_suppressed)) {
-        write_func_header();
-        fold_ANDBASGs();
-        do_dd_analysis_for_be();
-        simpcfg(1, 0);
-        rotate_loops();
-        straighten_traces_in_cfg();
-        disclose_vector_operations(0);
-        unsimplify();
-        disguise_vector_operations();
-        strip_implicit_states(f);
-        finalize_dd_edges();
-        disclose_vector_operations(0);
-        write_func_body();
-    }
-    erase_all();
-    currfuninfo = nullptr;
-    currfunc = nullptr;
-    restore_global_flags();
+void write_function() {
+    write_func_header();
+    write_func_body();
 }
 
 // ---- The end of the unit

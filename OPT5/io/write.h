@@ -11,9 +11,12 @@ class SYMTAB;
 struct LBL;
 struct LIST;
 
-// The last step of every function: prepares it for the code generator, writes its records and frees its body. A function
-// that is suppressed leaves no records.
-void output_function();
+// Ahead of writing the current function: locals that nothing names any more are not declared to the code generator; the
+// operand that stood for the state of the machine goes.
+void drop_unused_locals();
+void strip_implicit_states();
+// The records of the current function. Its blocks are consumed.
+void write_function();
 // After the last function: symbols' final types and retention, then the initializers. The caller closes the file.
 void write_end_of_unit();
 

@@ -3,14 +3,12 @@
 #include "OPT5/io/write.h"
 
 #include "IFILE/ifile.h"
-#include "OPT5/dd/dd.h"
 #include "OPT5/io/read.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/scalar/profile.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/target.h"
@@ -206,7 +204,6 @@ void wrbdlr(const LBL* labels) {
 
 void wrbblocks() {
     FUNINFO* f = currfuninfo;
-    initialize_CFG_profiling_annotation(true, true);
     renumber_bblocks();
     if (f->has_intrinsics)
         for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)

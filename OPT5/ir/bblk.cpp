@@ -3,7 +3,7 @@
 #include "OPT5/ir/bblk.h"
 
 #include "BITVEC/bitvec.h"
-#include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "UTIL/abort.h"
@@ -12,14 +12,6 @@
 
 int internal_label_index = 0;
 std::map<int32_t, LBL*> label_mapping;
-
-namespace {
-
-void mark_dominators_dirty(FUNINFO* f) {
-    if (f->dominators) f->dominators->dirty = true;
-}
-
-} // namespace
 
 BBLK::~BBLK() {
     for (BITVEC* set : live_sets) delete set;
@@ -122,7 +114,7 @@ BBLK* mkbblock(LIST* list, BBLK* next, FUNINFO* funinfo) {
     bb->dflink = bb->uolink = next;
     bb->statements = list;
     find_positions(bb);
-    mark_dominators_dirty(funinfo);
+    graph_was_changed(funinfo);
     return bb;
 }
 
@@ -161,7 +153,7 @@ void delink_old_bb(BBLK* bb) {
     for (BBLK* b = f->bb_list; b; b = b->dflink)
         if (b->uolink == bb) b->uolink = bb->uolink;
     if (f->exit_bb == bb) f->exit_bb = nullptr;
-    mark_dominators_dirty(f);
+    graph_was_changed(f);
     erase_bblock(bb);
     delete bb;
 }
@@ -224,8 +216,10 @@ void note_endless_function() {
 void renumber_bblocks() {
     BBLK* previous = nullptr;
     int n = 0;
+    bool moved = false;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        bb->dfn = ++n;
+        moved |= bb->dfn != ++n;
+        bb->dfn = n;
         bb->rdflink = previous;
         previous = bb;
     }
@@ -235,7 +229,24 @@ void renumber_bblocks() {
     recount(branches);
     renumber_labels(branches);
     if (n) note_endless_function();
+    // Dominators and loops are kept by number.
+    if (moved) edges_were_changed(currfuninfo);
+    currfuninfo->facts |= fact::block_numbers;
 }
+
+namespace {
+
+bool numbers_still_hold() {
+    int n = 0;
+    bool in_order = true;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) in_order &= bb->dfn == ++n;
+    return in_order && currfuninfo->bb_count == n;
+}
+
+const FACT_FINDER numbers("block numbers", fact::block_numbers, fact::none, [](FACTS) { renumber_bblocks(); }, nullptr,
+                          numbers_still_hold);
+
+} // namespace
 
 // ---- Dumps
 

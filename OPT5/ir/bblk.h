@@ -89,7 +89,7 @@ EDGE* fast_sort_edge_list(EDGE* list);
 EDGE* copy_edge_list(const EDGE* list);
 void erase_edge(EDGE* edge);
 void erase_edge_list(EDGE* list);
-void connect(BBLK* from, BBLK* to);    // both lists; marks the dominators dirty
+void connect(BBLK* from, BBLK* to);    // both lists
 void disconnect(BBLK* from, BBLK* to);
 // The new block. Without `renumber` the depth-first numbers are stale: for a caller that splits many edges.
 BBLK* split_cfg_edge(BBLK* a, BBLK* b, bool renumber = true);

@@ -6,7 +6,7 @@
 // in `dflink` order by reverse postorder; both ends of every edge name each other.
 
 #include "OPT5/ir/bblk.h"
-#include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "UTIL/abort.h"
@@ -259,7 +259,7 @@ void number_blocks(FUNINFO* f, BBLK* all) {
     drop_unreachable_blocks(f, all);
     clear_visited();
     renumber_bblocks();
-    if (f->dominators) f->dominators->dirty = true;
+    edges_were_changed(f);
 }
 
 // Every block on one `uolink` chain: source order from the entry, then those that a pass put outside it.

@@ -1,13 +1,12 @@
 #include "OPT5/ir/dominator.h"
 
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "UTIL/abort.h"
 
 #include <algorithm>
-
-void (*find_live_variables_hook)(int, int) = nullptr;
 
 namespace {
 
@@ -76,7 +75,6 @@ void Dominator::builder() {
     idom.assign(n, UNDEFINED);
     ipostdom.assign(n, UNDEFINED);
     exit_dfn = f->exit_bb ? f->exit_bb->dfn : 0;
-    dirty = false;
     if (!f->bb_count) return;
 
     std::vector<std::vector<int>> succs(n), preds(n);
@@ -113,9 +111,7 @@ void Dominator::generate_tree_walk() {
 
 void Dominator::rebuild() { builder(); }
 
-void Dominator::refresh() {
-    if (dirty || saved_bb_count != currfuninfo->bb_count) builder();
-}
+void Dominator::refresh() { need(fact::dominators); }
 
 BBLK* Dominator::DFSblock(int dfn) {
     refresh();
@@ -237,8 +233,23 @@ void Dominator::print_POSTDOM(FILE* out) {
     print_tree_array(out, "POSTDOM", ipostdom);
 }
 
-void compute_dominators(bool with_live_variables) {
+namespace {
+
+void find(FACTS) {
     if (!currfuninfo->dominators) currfuninfo->dominators = std::make_unique<Dominator>();
     currfuninfo->dominators->rebuild();
-    if (with_live_variables && find_live_variables_hook) find_live_variables_hook(0, 0);
+}
+
+bool still_hold() {
+    const Dominator known = *currfuninfo->dominators;
+    currfuninfo->dominators->rebuild();
+    return known.idom == currfuninfo->dominators->idom && known.ipostdom == currfuninfo->dominators->ipostdom;
+}
+
+const FACT_FINDER dominators("dominators", fact::dominators, fact::block_numbers, find, nullptr, still_hold);
+
+} // namespace
+
+void compute_dominators(bool with_live_variables) {
+    need(fact::dominators | (with_live_variables ? fact::live_variables : fact::none));
 }

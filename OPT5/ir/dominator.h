@@ -1,7 +1,7 @@
 // Immediate dominators and post-dominators of the current function, computed on demand.
 //
-// Source: K. D. Cooper, T. J. Harvey, K. Kennedy, "A Simple, Fast Dominance Algorithm", 2001. Every graph edit of this room
-// sets `dirty`; a query on dirty data, or after the block count changed, rebuilds.
+// Source: K. D. Cooper, T. J. Harvey, K. Kennedy, "A Simple, Fast Dominance Algorithm", 2001. Every query
+// needs `fact::dominators`, so that a graph edit before it costs a rebuild.
 #pragma once
 
 #include <cstdio>
@@ -15,7 +15,6 @@ public:
     static constexpr int UNDEFINED = -556;
 
     std::vector<int> idom, ipostdom; // by dfn
-    bool dirty = true;
 
     void rebuild();
     BBLK* immediate_dominator(int dfn); // null for the entry
@@ -44,8 +43,5 @@ private:
     int exit_dfn = 0;
 };
 
-// The live-variable analysis of the scalar room; null before it is installed.
-extern void (*find_live_variables_hook)(int, int);
-
-// Creates or rebuilds the current function's record; with `with_live_variables` the live sets too.
+// Makes the current function's record true; with `with_live_variables` the live sets too.
 void compute_dominators(bool with_live_variables);

@@ -3,19 +3,11 @@
 #include "OPT5/ir/bblk.h"
 
 #include "BITVEC/bitvec.h"
-#include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
-
-namespace {
-
-void mark_dominators_dirty(const BBLK* bb) {
-    if (bb->owner()->dominators) bb->owner()->dominators->dirty = true;
-}
-
-} // namespace
 
 EDGE* mkedge(BBLK* bb, EDGE* rest) { return new EDGE{bb, -1.0, rest}; }
 
@@ -106,13 +98,13 @@ void erase_edge_list(EDGE* list) {
 void connect(BBLK* from, BBLK* to) {
     from->successors = add_edge(to, from->successors);
     to->predecessors = add_edge(from, to->predecessors);
-    mark_dominators_dirty(from);
+    edges_were_changed(from->owner());
 }
 
 void disconnect(BBLK* from, BBLK* to) {
     from->successors = remove_edge(to, from->successors);
     to->predecessors = remove_edge(from, to->predecessors);
-    mark_dominators_dirty(from);
+    edges_were_changed(from->owner());
 }
 
 // ---- Targets of control statements
@@ -177,7 +169,7 @@ BBLK* make_block_on_edge(BBLK* a, BBLK* b) {
         n->live_sets[1] = new BITVEC(*b->live_sets[0]);
         for (int i : {2, 3}) n->live_sets[i] = new BITVEC(b->live_sets[0]->bits);
     }
-    mark_dominators_dirty(a);
+    edges_were_changed(a->owner());
     return n;
 }
 

@@ -295,6 +295,7 @@ void erase_all() {
     f->givens.clear();
     erase_eht(f);
     f->dominators.reset();
+    f->facts = fact::none;
     f->spmap->clear();
     f->snmap->clear();
     for (SYMTAB** list : {&f->new_syms, &f->pending_syms, &f->memory_syms, &f->scalar_syms}) erase_symbols(*list);

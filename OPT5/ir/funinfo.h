@@ -3,6 +3,7 @@
 #pragma once
 
 #include "IFILE/if_client.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/list.h"
 #include "OPT5/ir/scope.h"
 #include "OPT5/ir/serial_object.h"
@@ -140,6 +141,7 @@ public:
     bool has_intrinsics = false; // a built-in was read or made; never cleared
     bool has_vector_types = false, has_complex_types = false, simd_allowed = false;
     bool is_written = false;
+    FACTS facts = fact::none; // those that are true now; asked and changed through OPT5/ir/facts.h
     std::unique_ptr<Dominator> dominators;
     long temp_counter = 0;
     SYMTAB* ret_by_cctor_sym = nullptr;

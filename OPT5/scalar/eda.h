@@ -18,7 +18,6 @@ constexpr int NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
 // stream.
 void find_live_variables(int mode, bool with_lifetimes);
 void lva_cleanup();
-void init_live_variables(); // once: lets the dominator record ask for live sets
 // The bit of a symbol that is a candidate, or -1.
 int live_index(const SYMTAB* sym);
 

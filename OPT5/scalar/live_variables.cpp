@@ -11,7 +11,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
-#include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/seq.h"
@@ -170,7 +170,6 @@ void lva_cleanup() {
 }
 
 namespace {
-void for_dominators(int mode, int with_lifetimes) { find_live_variables(mode, with_lifetimes != 0); }
+const FACT_FINDER live_variables("live variables", fact::live_variables, fact::none,
+                                 [](FACTS) { find_live_variables(0, false); }, lva_cleanup);
 } // namespace
-
-void init_live_variables() { find_live_variables_hook = for_dominators; }

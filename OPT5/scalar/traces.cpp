@@ -10,7 +10,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
-#include "OPT5/scalar/profile.h"
+#include "OPT5/ir/profile.h"
 
 #include <algorithm>
 #include <cmath>

@@ -2,7 +2,7 @@
 
 #include "../ir/function_fixture.h"
 
-#include "OPT5/scalar/profile.h"
+#include "OPT5/ir/profile.h"
 #include "OPT5/scalar/sblk.h"
 #include "OPT5/scalar/simpcfg.h"
 

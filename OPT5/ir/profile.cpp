@@ -1,4 +1,4 @@
-#include "OPT5/scalar/profile.h"
+#include "OPT5/ir/profile.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"

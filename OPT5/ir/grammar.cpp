@@ -1,16 +1,20 @@
-// The shape of a tree just read: every node stands where its operator may stand, under operands that it can have.
-//
-// The I-file's records fix how many operands a node has, not what they are. What is refused here is what no parser writes
-// and what the optimizer could only misread: a label used as a value, a case outside a switch, an indirection through what
-// is no pointer. Afterwards the walkers of the optimizer may rely on the shapes.
+#include "OPT5/ir/grammar.h"
 
-#include "OPT5/io/read_client.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/global.h"
 
-#include "OPT5/ir/node.h"
-
-#include <climits>
+#include <cstdio>
 
 namespace {
+
+struct GRAMMAR_FAULT {
+    std::string text;
+};
+
+[[noreturn]] void refuse(const std::string& text) { throw GRAMMAR_FAULT{text}; }
+
+// Whether the tree stands in a block: the forms of the graph are allowed, those that only a parser writes are not.
+bool in_graph = false;
 
 enum class ROLE { statement, value, arguments, label, field, arms, cases, case_label };
 
@@ -29,7 +33,7 @@ const char* role_text(ROLE role) {
 }
 
 [[noreturn]] void out_of_place(const NODE* t, ROLE role) {
-    refuse_input(std::string(t ? opname(t->op) : "nothing") + " stands where " + role_text(role) + " must stand");
+    refuse(std::string(t ? opname(t->op) : "nothing") + " stands where " + role_text(role) + " must stand");
 }
 
 bool is_statement_only(int op) {
@@ -39,6 +43,7 @@ bool is_statement_only(int op) {
     case SWITCH:
     case BRANCH:
     case CBRANCH:
+    case IF:
     case LOOP:
     case ENDLOOP: return true;
     default: return false;
@@ -89,16 +94,28 @@ void check_cases(const NODE* t) {
 }
 
 void check_pointer(const NODE* t, const char* what) {
-    if (!t->left->type->is_pointer()) refuse_input(std::string(what) + " through what is no pointer");
+    if (!t->left->type->is_pointer()) refuse(std::string(what) + " through what is no pointer");
 }
 
 void check_integer(const NODE* t, const char* what) {
-    if (!t->type->is_int() && !t->type->is_enum()) refuse_input(std::string(what) + " of type " + t->type->printstr());
+    if (!t->type->is_int() && !t->type->is_enum()) refuse(std::string(what) + " of type " + t->type->printstr());
 }
 
 // What is true or false is a scalar, or a mask of truth values.
 void check_truth_value(const NODE* t) {
-    if (!t->type->is_scalar() && !t->type->is_vector()) refuse_input("the truth of a " + t->type->printstr());
+    if (!t->type->is_scalar() && !t->type->is_vector()) refuse("the truth of a " + t->type->printstr());
+}
+
+// The end of a counted loop is the condition of the IF that closes it.
+void check_IF(const NODE* t) {
+    if (!in_graph) refuse("an IF in the input");
+    if (!t->left || t->left->op != ENDLOOP) {
+        check(t->left, ROLE::value);
+        check_truth_value(t->left);
+    }
+    if (!t->right || t->right->op != COMMA) out_of_place(t->right, ROLE::arms);
+    check(t->right->left, ROLE::label);
+    check(t->right->right, ROLE::label);
 }
 
 void check_operands(const NODE* t) {
@@ -148,6 +165,7 @@ void check_operands(const NODE* t) {
         check(t->right, ROLE::label);
         check_truth_value(t->left);
         return;
+    case IF: check_IF(t); return;
     case LOOP:
         check(t->left, ROLE::value);
         check(t->right, ROLE::label);
@@ -179,18 +197,18 @@ void check_constant(const NODE* t) {
     const TYPE* type = t->type->is_vector() ? t->type->raw_elem_type() : t->type;
     const bool integer = type->is_int() || type->is_enum() || type->is_pointer() || type->is_fixed();
     if (t->op == FCON ? !type->is_float() : !integer)
-        refuse_input(std::string("a constant ") + (t->op == FCON ? "FCON" : "ICON") + " of type " + t->type->printstr());
+        refuse(std::string("a constant ") + (t->op == FCON ? "FCON" : "ICON") + " of type " + t->type->printstr());
 }
 
 void check_value(const NODE* t, ROLE role) {
     if (has_a_role_of_its_own(t->op) || (role != ROLE::statement && is_statement_only(t->op))) out_of_place(t, role);
     switch (t->op) {
     case NAME:
-        if (!t->u.sym) refuse_input("a NAME without a symbol");
+        if (!t->u.sym) refuse("a NAME without a symbol");
         break;
     case ICON:
     case FCON: check_constant(t); break;
-    case VREG: refuse_input("a virtual register in the input");
+    case VREG: refuse("a virtual register in the input");
     default: break;
     }
     check_operands(t);
@@ -207,7 +225,7 @@ void check(const NODE* t, ROLE role) {
     case ROLE::cases: check_cases(t); return;
     case ROLE::label:
         if (t->op != LABELREF) out_of_place(t, role);
-        if (!t->u.lval.fits<int32_t>()) refuse_input("label number " + std::to_string(t->u.lval.value) + " is out of range");
+        if (!t->u.lval.fits<int32_t>()) refuse("label number " + std::to_string(t->u.lval.value) + " is out of range");
         return;
     case ROLE::field:
         if (t->op != FIELD || !t->mval) out_of_place(t, role);
@@ -228,13 +246,42 @@ void check(const NODE* t, ROLE role) {
 
 } // namespace
 
-void check_statement(const NODE* tree) { check(tree, ROLE::statement); }
+namespace {
 
-void check_initializer_item(const NODE* tree) {
-    if (tree->op == ENDINIT) return;
-    if (tree->op == SKIP) {
-        if (tree->left) check(tree->left, ROLE::value);
-        return;
+std::string fault_of(const NODE* tree, ROLE role) {
+    try {
+        check(tree, role);
+    } catch (const GRAMMAR_FAULT& fault) {
+        return fault.text;
     }
-    check(tree, ROLE::value);
+    return {};
+}
+
+} // namespace
+
+std::string grammar_fault_of_statement(const NODE* tree) {
+    in_graph = false;
+    return fault_of(tree, ROLE::statement);
+}
+
+std::string grammar_fault_of_initializer_item(const NODE* tree) {
+    in_graph = false;
+    if (tree->op == ENDINIT) return {};
+    if (tree->op == SKIP) return tree->left ? fault_of(tree->left, ROLE::value) : std::string();
+    return fault_of(tree, ROLE::value);
+}
+
+int validate_grammar() {
+    in_graph = true;
+    int errors = 0;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        if (bb->is_in_LIR_form()) continue;
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            const std::string fault = fault_of(s->first, ROLE::statement);
+            if (fault.empty()) continue;
+            std::fprintf(fdebug ? fdebug : stderr, " +++++ %s: %s\n", bb->str(), fault.c_str());
+            ++errors;
+        }
+    }
+    return errors;
 }

@@ -1,0 +1,155 @@
+#include "OPT5/driver/pipeline.h"
+
+#include "OPT5/driver/driver.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/grammar.h"
+#include "UTIL/abort.h"
+
+#include <cctype>
+#include <cstdio>
+#include <ctime>
+#include <vector>
+
+namespace {
+
+register_option pass_debug_validate("debug:validate"), pass_debug_skip("debug:skip"), pass_debug_only("debug:only"),
+    pass_debug_list_rows("debug:list_rows");
+
+bool current_function_has_blocks() { return currfuninfo && currfuninfo->bb_list; }
+
+void print_current_function() {
+    if (current_function_has_blocks() && fdebug) prbbinfix(fdebug);
+}
+
+void announce(const char* word, const ROW& row, const std::string& label) {
+    if (!print_debug) return;
+    debug_printf("\n\n\t\t\t---------- %s %s '%s' ----------\n", word, label.c_str(), row.name);
+    debug_flush();
+}
+
+void validate_current_function(const ROW& row, const std::string& label) {
+    if (!current_function_has_blocks()) return;
+    const int errors = validate_cfg() + validate_stmts() + validate_grammar() + validate_facts();
+    if (errors == 0) return;
+    const std::string text = label + " '" + row.name + "' left " + std::to_string(errors) + " errors";
+    abort_optimizer(text.c_str());
+}
+
+void do_work(const ROW& row) {
+    if (row.condition && !row.condition()) return;
+    if (row.frame) row.frame->begin();
+    if (row.needs) need(row.needs);
+    row.action();
+    if (row.frame) row.frame->end();
+    if (currfuninfo) changed(row.leaves); // the last step leaves no current function
+}
+
+} // namespace
+
+void run_row(const ROW& row, const std::string& label, bool skip) {
+    if (skip || is_left_out(row)) {
+        announce("SKIPPING", row, label);
+        return;
+    }
+    announce("ENTERING", row, label);
+    if (print_debug) print_current_function();
+    const bool timed = print_debug || enable_time_stats;
+    const clock_t start = timed ? std::clock() : 0;
+    FUNINFO* const funinfo = currfuninfo;
+    do_work(row);
+    if (timed) {
+        const clock_t ticks = std::clock() - start;
+        if (print_debug) debug_printf("(%.1f sec for pass.)\n", static_cast<double>(ticks) / CLOCKS_PER_SEC);
+        if (funinfo) funinfo->time += ticks;
+    }
+    if (print_debug) debug_printf("\n");
+    announce("EXITING", row, label);
+    if (print_debug) print_current_function();
+    if (pass_debug_validate) validate_current_function(row, label);
+}
+
+namespace {
+void run_rows(ROWS rows, const char* table) {
+    for (const ROW& row : rows) run_row(row, table, false);
+}
+} // namespace
+
+void run_rows_behind_reading() { run_rows(rows_behind_reading(), "reading:"); }
+void run_rows_ahead_of_output() { run_rows(rows_ahead_of_output(), "output:"); }
+
+// ---- Rows by name
+
+std::string switch_name(const ROW& row) {
+    std::string out;
+    for (const char* p = row.name; *p; ++p) {
+        if (std::isalnum(static_cast<unsigned char>(*p)))
+            out += static_cast<char>(std::tolower(static_cast<unsigned char>(*p)));
+        else if (!out.empty() && out.back() != '-')
+            out += '-';
+    }
+    while (!out.empty() && out.back() == '-') out.pop_back();
+    return out;
+}
+
+namespace {
+
+std::vector<std::string> names_of(const register_option& list) {
+    std::vector<std::string> names(1);
+    for (const char c : list.text())
+        if (c == '+')
+            names.emplace_back();
+        else
+            names.back() += c;
+    return names;
+}
+
+bool names(const register_option& list, const ROW& row) {
+    const std::string name = switch_name(row);
+    for (const std::string& word : names_of(list))
+        if (word == name) return true;
+    return false;
+}
+
+template <class F>
+void for_each_row(F&& visit) {
+    for (const ROW& row : rows_behind_reading()) visit("reading", row);
+    for (const ROW& row : rows_of_steps()) visit("steps", row);
+    for (const ROW& row : rows_ahead_of_output()) visit("output", row);
+}
+
+void check_names(const register_option& list, const char* word) {
+    if (list.text().empty()) return;
+    for (const std::string& name : names_of(list)) {
+        const ROW* found = nullptr;
+        for_each_row([&](const char*, const ROW& row) {
+            if (switch_name(row) == name) found = &row;
+        });
+        if (!found) fail_run(std::string("zopt: --debug:") + word + ": no row of the pipeline is named \"" + name + "\"");
+        if (found->kind == ROW::FIXED) fail_run(std::string("zopt: --debug:") + word + ": \"" + name + "\" runs always");
+    }
+}
+
+void list_rows() {
+    for_each_row([](const char* table, const ROW& row) {
+        std::printf("%-8s %s%-34s %s\n", table, row.kind == ROW::FIXED ? "*" : " ", switch_name(row).c_str(), row.name);
+    });
+}
+
+} // namespace
+
+bool is_left_out(const ROW& row) {
+    if (row.kind == ROW::FIXED) return false;
+    if (!pass_debug_skip.text().empty() && names(pass_debug_skip, row)) return true;
+    return !pass_debug_only.text().empty() && !names(pass_debug_only, row);
+}
+
+void check_row_switches() {
+    if (pass_debug_list_rows) list_rows();
+    check_names(pass_debug_skip, "skip");
+    check_names(pass_debug_only, "only");
+}
+
+bool L1() { return opt_level() >= 1; }
+bool L2() { return opt_level() >= 2; }

@@ -1,0 +1,68 @@
+// The last step of every function: what is done for the code generator, then writing.
+//
+// The rows take back what only the optimizer wants (operators in place of built-ins, scaled subscripts spelled out) and
+// settle what the output states of the function as it stands (registers, layout, exception table). The order is part of
+// their contract: no row behind "unsimplify" simplifies.
+#include "OPT5/driver/driver.h"
+#include "OPT5/driver/pipeline.h"
+
+#include "OPT5/cd/vectors.h"
+#include "OPT5/dd/dd.h"
+#include "OPT5/io/write.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/profile.h"
+#include "OPT5/mvp/mvp.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/fcp.h"
+#include "OPT5/scalar/lowering.h"
+#include "OPT5/scalar/simpcfg.h"
+#include "OPT5/target/target.h"
+
+namespace {
+
+// A function that was folded into all its callers leaves no records.
+bool is_written() { return !TEST_FLAG(currfuninfo, FUN_is_suppressed); }
+
+constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED;
+constexpr bool (*always)() = nullptr;
+using fact::none;
+
+// clang-format off
+const ROW rows[] = {
+    // kind, name, frame, condition, action, needs, leaves
+    {FIXED, "drop unused locals",     nullptr, always, drop_unused_locals, none, none},
+    {F,     "combine assignments",    nullptr, always, combine_asgs_to_memory, none, none},
+    {F,     "switch cases",           nullptr, always, optimize_SWITCH_cases, none, none},
+    {FIXED, "register definitions",   nullptr, always, [] { init_reg_defs(); }, none, none},
+    {F,     "allocate registers",     nullptr, always, allocate_regs, none, none},
+    {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, none, none},
+    {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, none},
+    {F,     "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, none},
+    {F,     "last simpcfg",           nullptr, is_written, [] { simpcfg(1, 0); }, none, none},
+    {F,     "rotate loops",           nullptr, is_written, rotate_loops, none, none},
+    {F,     "straighten traces",      nullptr, is_written, straighten_traces_in_cfg, none, none},
+    {F,     "last disclose vectors",  nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
+    {F,     "unsimplify",             nullptr, is_written, unsimplify, none, none},
+    {FIXED, "last disguise vectors",  nullptr, is_written, disguise_vector_operations, none, none},
+    {FIXED, "machine state",          nullptr, is_written, strip_implicit_states, none, none},
+    {F,     "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
+    {F,     "vectors for output",     nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
+    {F,     "load speculation",       nullptr, is_written, finalize_ldspec_advice, none, none},
+    {FIXED, "prune exception table",  nullptr, is_written, prune_exception_table, none, none},
+    {F,     "profile",                nullptr, is_written, [] { initialize_CFG_profiling_annotation(true, true); }, none, none},
+};
+// clang-format on
+
+} // namespace
+
+ROWS rows_ahead_of_output() { return {rows, sizeof rows / sizeof rows[0]}; }
+
+void output_function() {
+    run_rows_ahead_of_output();
+    if (is_written()) write_function();
+    erase_all();
+    currfuninfo = nullptr;
+    currfunc = nullptr;
+    restore_global_flags();
+}

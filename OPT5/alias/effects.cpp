@@ -145,7 +145,7 @@ bool any_lvalue_read(const NODE* t, const P& predicate) {
             }
         }
         if (is_lvalue(t) && predicate(t)) return true;
-        while (t->op == STDOT) t = t->left; // one access with its parts
+        t = without_members(t); // one access with its parts
         if (t->op == NAME) return false;
         if (any_lvalue_read(t->right, predicate)) return true;
     }
@@ -229,7 +229,7 @@ bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t) {
 
 // ---- What a tree reads
 
-// Without regard to the marks of arrays and structures: this is asked between passes that set marks.
+// Whether or not the marks are known: this is asked between the passes that set them.
 static bool is_exposed(const SYMTAB* sym) {
     return sym->level == 0 || sym->is_aliased() || currfuninfo->address_taken_local;
 }

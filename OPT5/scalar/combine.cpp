@@ -135,7 +135,7 @@ OUTCOME chain(const NODE* first, const NODE* second) {
 // ---- Pairs
 
 bool address_depends_on(const NODE* lvalue, const NODE* store) {
-    while (lvalue->op == STDOT) lvalue = lvalue->left;
+    lvalue = object_of_place(lvalue);
     if (lvalue->op == NAME) return false;
     if (lvalue->op == UMULT && lvalue->right && tree_modifies_lvalue_in_tree(store, lvalue->right)) return true;
     return tree_modifies_lvalue_in_tree(store, lvalue->left);

@@ -31,8 +31,7 @@ const NODE* stored_member(const NODE* t) {
     if (t->op != ASG || tree_is_arg_prolog(t) || t->left->op != STDOT) return nullptr;
     const NODE* lvalue = t->left;
     if (!lvalue->type->is_scalar() || lvalue_is_volatile(lvalue)) return nullptr;
-    const NODE* object = lvalue;
-    while (object->op == STDOT) object = object->left;
+    const NODE* object = without_members(lvalue);
     if (object->op != UMULT || object->left->op != NAME || std::strcmp(object->left->u.sym->name, "this"))
         return nullptr;
     return lvalue;

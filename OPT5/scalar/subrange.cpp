@@ -45,8 +45,7 @@ bool have_same_base(const ADDRESS_FORM& a, const ADDRESS_FORM& b) {
 } // namespace
 
 const NODE* get_first_non_stdot_node_down_the_left_side_of_tree(const NODE* t) {
-    while (t && t->op == STDOT) t = t->left;
-    return t;
+    return t ? without_members(t) : nullptr;
 }
 
 bool is_plain_assignment(const NODE* t) { return t->op == ASG || t->op == STASG || t->op == ARASG; }

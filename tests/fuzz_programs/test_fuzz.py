@@ -13,6 +13,8 @@ from pathlib import Path
 ROOT = Path(__file__).resolve().parent.parent.parent
 sys.path.insert(0, str(ROOT / "tools"))
 from genc_lib import values  # noqa: E402
+from genc_lib.changing_loops import ChangingLoops  # noqa: E402
+from genc_lib.pointers import Pointers  # noqa: E402
 from genc_lib.program import Program  # noqa: E402
 from genc_lib.types import INT, LONG, UINT  # noqa: E402
 from zbench import Tools  # noqa: E402
@@ -124,10 +126,11 @@ class Faults(unittest.TestCase):
 class Generator(unittest.TestCase):
     def test_one_seed_one_text(self):
         for seed in (1, 2):
-            texts = {subprocess.run([sys.executable, ROOT / "tools" / "genc", "--seed", str(seed)], check=True,
-                                    env={**os.environ, "PYTHONHASHSEED": str(salt)}, capture_output=True).stdout
-                     for salt in (1, 2)}
-            self.assertEqual(len(texts), 1)
+            for kind in ("kernels", "pointers", "loops"):
+                texts = {subprocess.run([sys.executable, ROOT / "tools" / "genc", "--kind", kind, "--seed", str(seed)],
+                                        check=True, env={**os.environ, "PYTHONHASHSEED": str(salt)},
+                                        capture_output=True).stdout for salt in (1, 2)}
+                self.assertEqual(len(texts), 1)
         self.assertNotEqual(Program(1, 4).text(), Program(2, 4).text())
 
     def test_a_few_programs_hold_every_kind_of_statement(self):
@@ -139,6 +142,17 @@ class Generator(unittest.TestCase):
                      r"-= \d\) \{", r" % \d", r" / \d", r"<< ", r">> ", r"static const ", r"kernel\d\(g\d+", r"\]\[",
                      r"\*q\d+ = rs"):
             self.assertTrue(re.search(kind, text), kind)
+
+    def test_programs_of_pointers_and_of_changing_loops_hold_what_they_are_for(self):
+        for program, kinds in (
+                (Pointers, (r"\*\*gpp = ", r"restrict a\d", r"\(char \*\)", r"u\d\.l\[", r"s\d = \*?s", r"\*pp = ", r"same\(",
+                            r"static int kept", r"aim\(&", r"\(\*action\)", r"g[xy] = \w+ = ", r"w\d+ != e\d+")),
+                (ChangingLoops, (r"\+= k\) \{", r"\+= next\[\w+\]", r"slow\(k\)", r"= ask\(", r"\bkg = ", r"\*np = ", r"p\+\+;",
+                                 r"p = q;", r"-- > 0\) \{", r"do \{", r" != \du; u\+\+", r"327\d\d;", r"\(k = \(k & 7\) \+ 1\)",
+                                 r"\bvk = ", r"turn\(kp\)", r"\(i - 32700\)"))):
+            text = "\n".join(program(seed, 4).text() for seed in range(40))
+            for kind in kinds:
+                self.assertTrue(re.search(kind, text), kind)
 
     def test_intervals_hold_what_the_operators_give(self):
         spans = ((-5, 7), (-3, -1), (2, 9), (0, 0), (-1, 1))

@@ -1,9 +1,11 @@
-// Writes a translation unit of a given size for measurements: gen_unit FUNCTIONS STATEMENTS OUT.if
+// Writes a translation unit of a given size for measurements: gen_unit FUNCTIONS STATEMENTS OUT.if [STATICS [CASES]]
 //
 // Each function takes an int and a pointer, works on eight int and four long locals with STATEMENTS statements
 // (assignments, loads, stores, multiply-accumulates, forward branches, a counted loop around each sixteen) and returns
 // a long. `main` calls every function and prints a checksum with `put_i32`, so that a unit can be executed before and
-// after. The same arguments give the same bytes. About eleven nodes a statement; the number goes to standard output.
+// after. With STATICS, each function adds to one of so many static variables of the file; with CASES, it has a switch of
+// so many cases that all end in a break. The same arguments give the same bytes. About eleven nodes a statement; the
+// number goes to standard output.
 
 #include "tools/model/ic_builder.h"
 
@@ -24,6 +26,8 @@ enum OP {
     UAND = 16,
     XORB = 19,
     RETURN = 36,
+    SWITCH = 40,
+    CASE = 47,
     COMMA = 56,
     PCOMMA = 57,
     ASG = 58,
@@ -37,7 +41,8 @@ enum OP {
 
 class GENERATOR : IC_BUILDER {
 public:
-    GENERATOR(FILE* out, int functions, int statements) : n_functions(functions), n_statements(statements) {
+    GENERATOR(FILE* out, int functions, int statements, int statics, int cases)
+        : n_functions(functions), n_statements(statements), n_statics(statics), n_cases(cases) {
         start(out, "generated.c");
     }
 
@@ -50,8 +55,10 @@ public:
         put = global("_put_i32", put_type, 5);
         std::vector<IC_SYMBOL*> bodies;
         for (int i = 0; i < n_functions; ++i) bodies.push_back(global("_f" + std::to_string(i), body_type, 2));
+        for (int i = 0; i < n_statics; ++i) statics.push_back(global("_s" + std::to_string(i), pkg.int_t, 3));
         IC_SYMBOL* main_sym = global("_main", main_type, 2);
-        for (IC_SYMBOL* f : bodies) write_function(f);
+        for (size_t i = 0; i < bodies.size(); ++i)
+            write_function(bodies[i], statics.empty() ? nullptr : statics[i % statics.size()]);
         write_main(main_sym, bodies, data);
         std::printf("%ld nodes\n", node_count);
         return I_FILE::if_close(file, false, false) == 0;
@@ -131,7 +138,29 @@ private:
         file->if_write_label(out);
     }
 
-    void write_function(IC_SYMBOL* f) {
+    // switch (a) { case 0: x0 += 0; break; case 1: x1 += 1; break; ... }
+    void switch_over(IC_SYMBOL* selector) {
+        TYPE* t = pkg.int_t;
+        const uint32_t first = next_label, out = first + static_cast<uint32_t>(n_cases);
+        next_label = out + 1;
+        IC_NODE* list = nullptr;
+        for (int i = 0; i < n_cases; ++i) {
+            IC_NODE* one = node(CASE, t, icon(i), label_ref(first + static_cast<uint32_t>(i)));
+            list = list ? node(COMMA, t, list, one) : one;
+        }
+        IC_NODE* whole = node(SWITCH, t, name(selector), list);
+        whole->number = static_cast<uint32_t>(n_cases);
+        statement(whole);
+        statement(node(BRANCH, t, label_ref(out)));
+        for (int i = 0; i < n_cases; ++i) {
+            file->if_write_label(first + static_cast<uint32_t>(i));
+            statement(node(PLUSASG, t, name(xs[i & 7]), icon(i)));
+            statement(node(BRANCH, t, label_ref(out)));
+        }
+        file->if_write_label(out);
+    }
+
+    void write_function(IC_SYMBOL* f, IC_SYMBOL* own_static) {
         next_label = 1;
         psn.line = 1;
         file->if_write_begin_func(f, &psn);
@@ -149,9 +178,12 @@ private:
         for (int i = 0; i < 8; ++i)
             statement(node(ASG, pkg.int_t, name(xs[i]), node(PLUS, pkg.int_t, name(a2), icon(i))));
         for (IC_SYMBOL* s : ys) statement(node(ASG, pkg.long_t, name(s), node(SCONV, pkg.long_t, name(a2))));
+        if (own_static) statement(node(PLUSASG, pkg.int_t, name(own_static), name(a2)));
+        if (n_cases) switch_over(a2);
         for (int done = 0; done < n_statements; done += 16) loop(std::min(16, n_statements - done));
         IC_NODE* sum = name(ys[0]);
         for (int i = 1; i < 4; ++i) sum = node(XORB, pkg.long_t, sum, name(ys[i]));
+        if (own_static) sum = node(PLUS, pkg.long_t, sum, node(SCONV, pkg.long_t, name(own_static)));
         for (IC_SYMBOL* s : xs) sum = node(PLUS, pkg.long_t, sum, node(SCONV, pkg.long_t, name(s)));
         statement(node(RETURN, pkg.long_t, name(f), sum));
         file->if_write_end_func(&psn);
@@ -175,7 +207,8 @@ private:
         file->if_write_end_func(&psn);
     }
 
-    int n_functions, n_statements;
+    int n_functions, n_statements, n_statics, n_cases;
+    std::vector<IC_SYMBOL*> statics;
     TYPE *body_type = nullptr, *put_type = nullptr, *main_type = nullptr;
     IC_SYMBOL *put = nullptr, *ptr = nullptr, *counter = nullptr;
     IC_SYMBOL* xs[8] = {};
@@ -188,8 +221,8 @@ private:
 } // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 4) {
-        std::fprintf(stderr, "usage: gen_unit FUNCTIONS STATEMENTS OUT.if\n");
+    if (argc < 4 || argc > 6) {
+        std::fprintf(stderr, "usage: gen_unit FUNCTIONS STATEMENTS OUT.if [STATICS [CASES]]\n");
         return 2;
     }
     FILE* out = std::fopen(argv[3], "wb");
@@ -197,5 +230,6 @@ int main(int argc, char** argv) {
         std::perror(argv[3]);
         return 1;
     }
-    return GENERATOR(out, std::atoi(argv[1]), std::atoi(argv[2])).run() ? 0 : 1;
+    auto number = [&](int i) { return i < argc ? std::atoi(argv[i]) : 0; };
+    return GENERATOR(out, number(1), number(2), number(4), number(5)).run() ? 0 : 1;
 }

@@ -20,8 +20,19 @@ namespace {
 
 bool is_plain_array(const TYPE* type) { return type->is_array() && !type->is_vector(); }
 
+// What the function in work adds to the marks of the program. Those stand in the symbols; a function names few of all, so
+// that only its own marks are taken back.
+std::vector<SYMTAB*> marked_globals;
+
 void mark(SYMTAB* sym) {
-    if (!sym->is_function()) sym->set_is_aliased(true);
+    if (sym->is_function() || sym->is_aliased()) return;
+    if (sym->level == 0) marked_globals.push_back(sym);
+    sym->set_is_aliased(true);
+}
+
+void unmark_globals() {
+    for (SYMTAB* s : marked_globals) s->set_is_aliased(false);
+    marked_globals.clear();
 }
 
 // `is_access_address`: `t` is the pointer of an access, from which the object can be told.
@@ -109,7 +120,7 @@ bool marks_are_known() { return marked_function && marked_function == currfuninf
 
 bool may_be_reached_by_pointers(const SYMTAB* sym) {
     if (sym->is_function()) return false;
-    return !marks_are_known() || sym->is_aliased();
+    return !marks_are_known() || sym->is_aliased() || (sym->level == 0 && file_symbol_may_be_aliased(sym));
 }
 
 namespace {
@@ -126,11 +137,11 @@ void set_marks(POINTER_WRITES* writes) {
     FUNINFO* f = currfuninfo;
     for_each_symbol([](SYMTAB* s) { s->set_is_aliased(false); });
     for (SYMTAB* s : f->dropped_syms) s->set_is_aliased(false);
-    for (SYMTAB* s = global_symbols; s; s = s->next) s->set_is_aliased(file_symbol_may_be_aliased(s));
+    unmark_globals();
     for_each_tree(f, [writes](const NODE* tree) {
         mark_addressed(tree, false);
         for_each_subtree(tree, [writes](const NODE* t) {
-            if (SYMTAB* sym = written_in_part(t)) sym->set_is_aliased(true);
+            if (SYMTAB* sym = written_in_part(t)) mark(sym);
             if (writes) writes->collect(t);
         });
     });

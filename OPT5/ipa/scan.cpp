@@ -348,7 +348,14 @@ void check_fun_for_byref_asgs(SYMTAB* sym) {
 
 void add_call_edge(FUNINFO* caller, FUNINFO* callee, bool value_unused) {
     if (TEST_FLAG(callee, FUN_is_main)) program.main_runs_once = false;
-    count_in(&caller->callees, callee);
+    // A function may call thousands of others. What nobody calls yet is on no list, and of the file's roots, which are
+    // entered one after the other, only the last may come again.
+    CALLEE* last = caller->callees;
+    const bool is_new = !TEST_FLAG(callee, FUN_is_called) || (caller == program.file_fun && !(last && last->callee == callee));
+    if (is_new)
+        caller->callees = new CALLEE{callee, 1, last};
+    else
+        count_in(&caller->callees, callee);
     set_flags(callee, FUN_is_called);
     ++callee->ncallers;
     if (!value_unused) set_flags(callee, FUN_value_needed);

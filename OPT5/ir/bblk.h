@@ -82,6 +82,8 @@ EDGE* mkedge(BBLK* bb, EDGE* rest);
 EDGE* add_edge(BBLK* bb, EDGE* list, double prob = -1.0); // unless `bb` is on the list
 EDGE* remove_edge(BBLK* bb, EDGE* list);
 EDGE* edge_memberp(const BBLK* bb, EDGE* list);
+// Whether control may pass from one to the other, told by the shorter of the two lists.
+bool is_edge(const BBLK* from, const BBLK* to);
 int edge_length(const EDGE* list);
 EDGE* rev_edge_list(EDGE* list);
 EDGE* sort_edge_list(EDGE* list);
@@ -89,7 +91,7 @@ EDGE* fast_sort_edge_list(EDGE* list);
 EDGE* copy_edge_list(const EDGE* list);
 void erase_edge(EDGE* edge);
 void erase_edge_list(EDGE* list);
-void connect(BBLK* from, BBLK* to);    // both lists
+void connect(BBLK* from, BBLK* to, double prob = -1.0); // both lists, unless it is there
 void disconnect(BBLK* from, BBLK* to);
 // The new block. Without `renumber` the depth-first numbers are stale: for a caller that splits many edges.
 BBLK* split_cfg_edge(BBLK* a, BBLK* b, bool renumber = true);

@@ -16,6 +16,13 @@ EDGE* edge_memberp(const BBLK* bb, EDGE* list) {
     return list;
 }
 
+bool is_edge(const BBLK* from, const BBLK* to) {
+    const EDGE *out = from->successors, *in = to->predecessors;
+    for (; out && in; out = out->rest, in = in->rest)
+        if (out->first == to || in->first == from) return true;
+    return false;
+}
+
 EDGE* add_edge(BBLK* bb, EDGE* list, double prob) {
     if (edge_memberp(bb, list)) return list;
     return new EDGE{bb, prob, list};
@@ -95,9 +102,10 @@ void erase_edge_list(EDGE* list) {
     }
 }
 
-void connect(BBLK* from, BBLK* to) {
-    from->successors = add_edge(to, from->successors);
-    to->predecessors = add_edge(from, to->predecessors);
+void connect(BBLK* from, BBLK* to, double prob) {
+    if (is_edge(from, to)) return;
+    from->successors = new EDGE{to, prob, from->successors};
+    to->predecessors = new EDGE{from, prob, to->predecessors};
     edges_were_changed(from->owner());
 }
 

@@ -17,6 +17,9 @@
 #include "OPT5/simp/simp.h"
 #include "UTIL/abort.h"
 
+#include <unordered_map>
+#include <unordered_set>
+
 namespace {
 
 constexpr int MAX_THREADING_ROUNDS = 20;
@@ -31,14 +34,41 @@ BBLK* bypass_of(const BBLK* bb) {
     return target == bb ? nullptr : target;
 }
 
-void redirect(BBLK* bb, LIST* control, BBLK* from, BBLK* to) {
-    const EDGE* old = edge_memberp(from, bb->successors);
-    const double prob = old ? old->prob : -1.0;
-    subst_bb_for_bb_in_stmts(to, from, control);
-    disconnect(bb, from);
-    bb->successors = add_edge(to, bb->successors, prob);
-    to->predecessors = add_edge(bb, to->predecessors, prob);
+// The block that a jump to `via` gets to in the end; `via` itself if that does more than jump, and in a ring of jumps.
+BBLK* end_of_jumps(BBLK* via) {
+    BBLK* target = via;
+    for (int round = 0; round < MAX_THREADING_ROUNDS; ++round) {
+        BBLK* next = bypass_of(target);
+        if (!next) break;
+        target = next;
+        if (target == via) break;
+    }
+    return target;
 }
+
+// What control statements name in place of blocks that only jump; looked up alone.
+class REPLACEMENTS {
+public:
+    bool empty() const { return to_of.empty(); }
+    void add(BBLK* from, BBLK* to) {
+        // The end of more jumps than are followed at once may be replaced in its turn.
+        if (targets.count(from))
+            for (auto& [_, target] : to_of)
+                if (target == from) target = to;
+        to_of[from] = to;
+        targets.insert(to);
+    }
+    void apply(NODE* control) const {
+        for_each_branch_target(control, [this](NODE* ref) {
+            const auto found = to_of.find(ref->lbl->bblock);
+            if (found != to_of.end()) remap_labelrefs(ref, ref->lbl, label_of_bb(found->second));
+        });
+    }
+
+private:
+    std::unordered_map<BBLK*, BBLK*> to_of;
+    std::unordered_set<BBLK*> targets;
+};
 
 bool is_written_as_do(const PRAGMA* p) { return p->kind == PRG_SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
 
@@ -172,23 +202,23 @@ private:
         return list;
     }
 
-    // Each successor that only jumps on gives way to the block that it jumps to.
+    // Each successor that only jumps on gives way to the block that it jumps to. The control statement, which may have
+    // thousands of targets, is rewritten in one walk.
     bool thread(BBLK* bb) {
-        bool changed = false;
+        REPLACEMENTS replacements;
+        std::vector<BBLK*> passed;
         for (BBLK* via : successors_of(bb)) {
-            BBLK* target = via;
-            for (int round = 0; round < MAX_THREADING_ROUNDS; ++round) {
-                BBLK* next = bypass_of(target);
-                if (!next) break;
-                target = next;
-                if (target == via) break; // a ring of jumps
-            }
+            BBLK* target = end_of_jumps(via);
             if (target == via) continue;
-            redirect(bb, control_of(bb), via, target);
-            remove_if_unreached(via);
-            changed = true;
+            const double prob = edge_memberp(via, bb->successors)->prob;
+            disconnect(bb, via);
+            connect(bb, target, prob);
+            replacements.add(via, target);
+            passed.push_back(via);
         }
-        return changed;
+        if (!replacements.empty()) replacements.apply(control_of(bb)->first);
+        for (BBLK* via : passed) remove_if_unreached(via);
+        return !passed.empty();
     }
 
     bool take_over_successors(BBLK* bb) {
@@ -264,16 +294,21 @@ bool resync_edges(BBLK* bb) {
     NODE* control = bb->branch();
     if (!control || bb->is_in_LIR_form()) return false;
     EDGE* targets = list_branch_targets(control, nullptr);
+    for (EDGE* e = targets; e; e = e->rest) e->first->visited = true; // until its edge is found
     bool changed = false;
     for (EDGE* e = bb->successors; e;) {
         BBLK* old = e->first;
         e = e->rest;
-        if (edge_memberp(old, targets)) continue;
+        const bool stays = old->visited;
+        old->visited = false;
+        if (stays) continue;
         disconnect(bb, old);
         changed = true;
     }
-    if (edge_length(targets) != edge_length(bb->successors)) {
-        for (EDGE* e = targets; e; e = e->rest) connect(bb, e->first);
+    for (EDGE* e = targets; e; e = e->rest) {
+        if (!e->first->visited) continue;
+        e->first->visited = false;
+        connect(bb, e->first);
         changed = true;
     }
     erase_edge_list(targets);

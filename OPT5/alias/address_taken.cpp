@@ -10,6 +10,8 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 
+#include <vector>
+
 bool file_symbols_are_known = false;
 
 bool file_symbol_may_be_aliased(const SYMTAB* sym) {
@@ -166,7 +168,10 @@ void init_aliasing_info(bool groups) {
 void reset_alias_info() {
     marked_function = nullptr;
     forget_groups();
-    if (currfuninfo) currfuninfo->spmap->clear();
+    if (currfuninfo) {
+        unmark_globals();
+        currfuninfo->spmap->clear();
+    }
     compute_alias_sets({});
 }
 
@@ -180,7 +185,10 @@ void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased) {
         for_each_subtree(tree, [=](const NODE* t) {
             SYMTAB* sym = written_in_part(t);
             if (!sym) return;
-            sym->set_is_aliased(aliased);
+            if (aliased)
+                mark(sym);
+            else
+                sym->set_is_aliased(false);
             if (clear_bitnum) sym->set_bitnum(-1);
         });
     });

@@ -2,6 +2,7 @@
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/simp.h"
 
 #include <algorithm>
@@ -180,7 +181,8 @@ NODE* tree_of_address(const LINEAR_ADDRESS& address, TYPE* type, const SYMTAB* s
         int64_t k = t.coefficient;
         const int op = k < 0 ? MINUS : PLUS;
         k = k < 0 ? -k : k;
-        if (k != 1) term = maketree(MULT, coerce_to_type(tp->long_t, term), mk_ICON(INT65(k), tp->long_t), tp->long_t);
+        if (k != 1)
+            term = made_exact(MULT, coerce_to_type(tp->long_t, term), mk_ICON(INT65(k), tp->long_t), tp->long_t, nullptr);
         tree = maketree(op, tree, term, own);
     }
     if (address.offset) tree = maketree(PLUS, tree, mk_ICON(INT65(address.offset), tp->long_t), own);

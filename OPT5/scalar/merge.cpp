@@ -24,6 +24,7 @@
 #include "OPT5/scalar/inductions.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/scalar/natural_loops.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
 #include "OPT5/target/target.h"
@@ -401,7 +402,7 @@ NODE* MERGE::step_size(const INDUCTION::STEP& step, int64_t size) {
     SYMTAB*& sym = step_sizes[{step.statement, size}];
     if (!sym) {
         NODE* amount = coerce_to_type(tp->long_t, copy_tree(step.amount));
-        if (size != 1) amount = maketree(MULT, amount, mk_ICON(INT65(size), tp->long_t), tp->long_t);
+        if (size != 1) amount = made_exact(MULT, amount, mk_ICON(INT65(size), tp->long_t), tp->long_t, nullptr);
         sym = make_temporary(simp_tree(amount, nullptr));
     }
     return mk_NAME(sym);

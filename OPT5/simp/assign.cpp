@@ -7,6 +7,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 
@@ -98,7 +99,7 @@ bool is_counter_step(const NODE* t) {
 }
 
 // Rewrites a chain of sums, or of one commutative operator, so that the term that is congruent to `x` comes first, and
-// the others follow it in one operand. False if there is none.
+// the others follow it in one operand, if that is exact. False if there is no such term.
 bool bubble_term(NODE* t, const NODE* x, int levels) {
     const bool is_sum = t->op == PLUS || t->op == MINUS;
     if (!levels || !operands_have_type(t)) return false;
@@ -113,10 +114,12 @@ bool bubble_term(NODE* t, const NODE* x, int levels) {
         NODE *found = l->left, *rest = l->right, *r = t->right;
         const int op1 = l->op, op2 = t->op;
         const bool keeps = !is_sum || op1 == PLUS;
+        const int of_rest = keeps ? op2 : op2 == PLUS ? MINUS : PLUS;
+        if (!signed_result_is_exact(of_rest, rest, r, l->type, nullptr)) return false;
         t->op = op1;
         t->left = found;
         t->right = l;
-        l->op = keeps ? op2 : op2 == PLUS ? MINUS : PLUS;
+        l->op = of_rest;
         l->left = rest;
         l->right = r;
         return true;
@@ -124,6 +127,7 @@ bool bubble_term(NODE* t, const NODE* x, int levels) {
     NODE* r = t->right;
     if (t->op != MINUS && continues(r) && bubble_term(r, x, levels - 1)) { // l op (x op2 rest)
         NODE *found = r->left, *rest = r->right;
+        if (!signed_result_is_exact(r->op, l, rest, r->type, nullptr)) return false;
         r->left = l;
         r->right = rest;
         t->left = found;
@@ -291,7 +295,8 @@ NODE* compound_with_value(NODE* t, struct LOOP* loop) {
     return nullptr;
 }
 
-// x op= (long)y of a narrower x: the bits that are dropped again need not be computed.
+// x op= (long)y of a narrower x: the bits that are dropped again need not be computed. The wider operation is exact
+// where one in x's own type may not be.
 void drop_widening(NODE* t) {
     const NODE* x = t->left;
     NODE* e = t->right;
@@ -306,7 +311,8 @@ void drop_widening(NODE* t) {
     }
     if (e->op != SCONV || !is_integer(e->type) || !is_integer(x->type) || bitfield_of(x) || is_bitfield_access(e->left))
         return;
-    if (x->type->size >= tp->int_t->size && e->type->size > x->type->size && same_integers(e->left->type, x->type))
+    if (x->type->size >= tp->int_t->size && e->type->size > x->type->size && same_integers(e->left->type, x->type) &&
+        signed_result_is_exact(op_of_opASG[t->op], x, e->left, x->type, nullptr))
         t->right = take_left(e);
 }
 

@@ -1,9 +1,11 @@
 // Reassociation: a chain of one operator as the list of its operands.
 //
 // A sum becomes terms with factors, one a value, and one constant; a product its operands and one constant; chains of
-// bit operators lose operands that meet themselves. A chain that nothing meets in stays as it is.
+// bit operators lose operands that meet themselves. A chain that nothing meets in stays as it is. The new order gives
+// other numbers on the way, and what may overflow there computes unsigned.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 
@@ -45,17 +47,20 @@ public:
 
     bool gains() const { return joined || constants > 1; }
 
-    // Sums are built from positive terms to negative ones, the constant last.
+    // Sums are built from positive terms to negative ones, the constant last. What the last operator gives is the
+    // number that the chain gave, if all before it is exact.
     NODE* build(struct LOOP* loop) {
+        for (const OPERAND& o : operands) operators_left += o.value ? 1 + (magnitude(o) != INT65(1)) : 0;
+        operators_left += (constants ? 1 : 0) - 1;
         NODE* chain = nullptr;
         for (bool negative : {false, true})
             for (OPERAND& o : operands)
-                if (o.value && (op == PLUS && signed_value(o.factor).is_negative()) == negative) {
-                    chain = append(chain, o, negative, loop);
+                if (o.value && is_negative(o) == negative) {
+                    chain = append(chain, o, loop);
                     o.value = nullptr;
                 }
         if (!chain) return mk_ICON(constants ? constant : neutral(), type);
-        return constants ? made(op, chain, mk_ICON(constant, type), type, loop) : chain;
+        return constants ? combined(op, chain, mk_ICON(constant, type), loop) : chain;
     }
 
     ~CHAIN() {
@@ -76,14 +81,14 @@ private:
                        : op == ANDB ? constant & v
                        : op == ORB  ? constant | v
                                     : constant ^ v;
-        constant = truncate_to_type(constant, type);
+        constant = truncated(constant);
     }
 
     bool add(const NODE* t, INT65 factor) {
         for (OPERAND& o : operands) {
             if (op == MULT || !o.value || !same_value(o.value, t)) continue;
             joined = true;
-            o.factor = truncate_to_type(o.factor + factor, type);
+            o.factor = truncated(o.factor + factor);
             const bool vanishes = op == XORB || (op == PLUS && o.factor.is_zero());
             if (vanishes) {
                 erase_tree(o.value);
@@ -92,23 +97,47 @@ private:
             return true;
         }
         if (operands.size() == MOST_OPERANDS) return false;
-        operands.push_back({copy_tree(t), truncate_to_type(factor, type)});
+        operands.push_back({copy_tree(t), truncated(factor)});
         return true;
     }
 
-    NODE* append(NODE* chain, const OPERAND& o, bool negative, struct LOOP* loop) const {
-        INT65 factor = op == PLUS ? signed_value(o.factor) : INT65(1);
-        if (negative && chain) factor = -factor;
-        NODE* term = factor == INT65(1) ? o.value : made(MULT, o.value, mk_ICON(factor, type), type, loop);
-        return chain ? made(negative ? static_cast<int>(MINUS) : op, chain, term, type, loop) : term;
+    INT65 truncated(INT65 v) {
+        const INT65 r = truncate_to_type(v, type);
+        is_exact = is_exact && r == v;
+        return r;
+    }
+
+    bool constant_is_unit() const { return constant >= INT65(-1) && constant <= INT65(1); }
+    bool is_negative(const OPERAND& o) const { return op == PLUS && signed_value(o.factor).is_negative(); }
+    // Of the factor that the term is multiplied by.
+    INT65 magnitude(const OPERAND& o) const {
+        const INT65 factor = op == PLUS ? signed_value(o.factor) : INT65(1);
+        return factor.is_negative() ? -factor : factor;
+    }
+
+    NODE* combined(int by, NODE* a, NODE* b, struct LOOP* loop) {
+        --operators_left;
+        const bool is_smaller =
+            op == MULT && operators_left == 1 && constants && !constant_is_unit(); // than the product
+        is_exact = is_exact && (operators_left == 0 || is_smaller || signed_result_is_exact(by, a, b, type, loop));
+        return is_exact ? made(by, a, b, type, loop) : made_exact(by, a, b, type, loop);
+    }
+
+    NODE* append(NODE* chain, const OPERAND& o, struct LOOP* loop) {
+        const bool negates = is_negative(o) && !chain;
+        NODE* term = o.value;
+        if (magnitude(o) != INT65(1) || negates)
+            term = combined(MULT, term, mk_ICON(negates ? -magnitude(o) : magnitude(o), type), loop);
+        if (!chain) return term;
+        return combined(is_negative(o) ? static_cast<int>(MINUS) : op, chain, term, loop);
     }
 
     const int op;
     TYPE* const type;
     std::vector<OPERAND> operands;
     INT65 constant;
-    int constants = 0;
-    bool joined = false;
+    int constants = 0, operators_left = 0;
+    bool joined = false, is_exact = true; // nothing is lost in the constants, and the operators so far are exact
 };
 
 bool is_associative(int op) { return op == PLUS || op == MINUS || op == MULT || op == ANDB || op == ORB || op == XORB; }

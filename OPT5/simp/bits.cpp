@@ -327,8 +327,9 @@ NODE* complement_sum(NODE* t, struct LOOP* loop) {
         return simp_node(to_binary(t, PLUS, x, icon_of(INT65(-1), t)), loop);
     }
     if (is_node_with_icon(inner, PLUS) || is_node_with_icon(inner, MINUS)) { // ~(x + c) is ~c - x
-        INT65 c = inner->op == PLUS ? inner->right->u.lval : -inner->right->u.lval;
-        set_icon(inner->right, ~c);
+        const INT65 c = ~(inner->op == PLUS ? inner->right->u.lval : -inner->right->u.lval);
+        if (!fits_or_wraps(c, inner->type)) return nullptr; // x - the least number
+        set_icon(inner->right, c);
         inner->op = MINUS;
         std::swap(inner->left, inner->right);
         erase_node(t);

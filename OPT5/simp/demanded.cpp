@@ -1,6 +1,7 @@
 // Bits that matter: a tree under a mask, a shift or a narrowing cast need not compute the others.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
@@ -50,7 +51,7 @@ private:
         return narrow(operand, mask, levels);
     }
 
-    // The operands first, then the node if one of them changed.
+    // The operands first, then the node if one of them changed. They are other numbers by then.
     NODE* operands(NODE* t, uint64_t mask, int levels, bool both) {
         const bool before = changed;
         changed = false;
@@ -58,7 +59,7 @@ private:
         if (both) t->right = narrow(t->right, mask, levels - 1);
         const bool any = changed;
         changed |= before;
-        return any ? simp_node(t, nullptr) : t;
+        return any ? kept_exact(t, nullptr) : t;
     }
     NODE* left_only(NODE* t, uint64_t mask, int levels) { return operands(t, mask, levels, false); }
     NODE* both(NODE* t, uint64_t mask, int levels) { return operands(t, mask, levels, true); }

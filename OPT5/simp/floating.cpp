@@ -3,6 +3,7 @@
 
 #include "OPT5/ir/global.h"
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/fold.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
@@ -242,7 +243,7 @@ NODE* simp_ABS(NODE* t, struct LOOP* loop) {
     }
     if (is_float) return t;
     if (tree_is_non_negative(x, loop)) return coerce_to_type(type, take_left(t));
-    if (tree_is_negative(x, loop)) return simp_node(to_unary(t, UMINUS, x), loop);
+    if (tree_is_negative(x, loop)) return kept_exact(to_unary(t, UMINUS, x), loop);
     return t;
 }
 

@@ -3,10 +3,11 @@
 // Canonical forms: the constant of a product stands outermost, on the right, and positive, under a negation if need be;
 // a product with a power of two stays a product; a division of an unsigned or non-negative value by a power of two is a
 // shift, a remainder a mask. Nothing is taken from the absence of overflow: where a rule holds for true values only,
-// the bounds of the operands must show that nothing wraps.
+// the bounds of the operands must show that nothing wraps. And nothing is made to overflow: see exact.h.
 
 #include "OPT5/ir/global.h"
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
@@ -38,30 +39,35 @@ NODE* multiply_by_small_constant(NODE* t, struct LOOP* loop) {
         return simp_node(to_unary(t, UMINUS, t->left), loop);
     }
     if (!is_negatable_constant(c)) return nullptr;
-    set_icon(c, -c->u.lval);
+    // The least number has a negative without being one, and is a product of powers of two alone.
+    const INT65 magnitude = -c->u.lval;
+    set_icon(c, magnitude);
+    if (power_of_2(magnitude) > 0 && !signed_result_is_exact(MULT, t->left, c, t->type, loop)) {
+        set_icon(c, -magnitude);
+        return nullptr;
+    }
     TYPE* type = t->type;
     return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
 }
 
 // -x * c: the sign goes to the constant. -x * -y: none is left.
 NODE* multiply_negation(NODE* t, struct LOOP* loop) {
-    if (!is_unary(t->left, UMINUS)) {
-        if (!is_unary(t->right, UMINUS)) return nullptr;
-        t->right = take_left(t->right);
-        TYPE* type = t->type;
-        return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
-    }
-    t->left = take_left(t->left);
-    if (is_icon(t->right)) {
-        set_icon(t->right, -t->right->u.lval);
+    const bool left = is_unary(t->left, UMINUS), right = is_unary(t->right, UMINUS);
+    if (!left && !right) return nullptr;
+    if (left && is_icon(t->right)) {
+        const INT65 c = -t->right->u.lval;
+        if (!fits_or_wraps(c, t->type)) return nullptr;
+        t->left = take_left(t->left);
+        set_icon(t->right, c);
         return simp_node(t, loop);
     }
-    if (is_unary(t->right, UMINUS)) {
-        t->right = take_left(t->right);
-        return simp_node(t, loop);
-    }
+    const NODE *x = left ? t->left->left : t->left, *y = right ? t->right->left : t->right;
+    if (left != right && !signed_result_is_exact(MULT, x, y, t->type, loop)) return nullptr;
+    if (left) t->left = take_left(t->left);
+    if (right) t->right = take_left(t->right);
     TYPE* type = t->type;
-    return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
+    t = simp_node(t, loop);
+    return left != right ? made(UMINUS, t, nullptr, type, loop) : t;
 }
 
 // |x| * |x| is x * x.
@@ -84,21 +90,26 @@ NODE* multiply_shifted_back(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
-// x * c1 * c2, (x << n) * c, and the constant of either operand moved outward.
+// x * c1 * c2, (x << n) * c, and the constant of either operand moved outward: what is multiplied by it, which is no
+// 0, 1 or -1, is smaller than the product.
 NODE* join_factors(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     if (is_icon(t->right)) {
         if (is_node_with_icon(inner, MULT)) {
-            set_icon(t->right, inner->right->u.lval * t->right->u.lval);
+            const INT65 product = inner->right->u.lval * t->right->u.lval;
+            if (!fits_or_wraps(product, t->type)) return nullptr;
+            set_icon(t->right, product);
             erase_node(inner->right);
             t->left = take_left(inner);
             return simp_node(t, loop);
         }
         if (const int n = inner->op == SLL ? shift_count_of(inner) : 0) {
-            set_icon(t->right, t->right->u.lval << INT65(n));
+            const INT65 product = t->right->u.lval << INT65(n);
+            if (!fits_or_wraps(product, t->type)) return nullptr;
+            set_icon(t->right, product);
             erase_node(inner->right);
             t->left = take_left(inner);
-            return simp_node(t, loop);
+            return kept_exact(t, loop);
         }
         return nullptr;
     }
@@ -112,7 +123,7 @@ NODE* join_factors(NODE* t, struct LOOP* loop) {
     return made(MULT, simp_node(t, loop), c, type, loop);
 }
 
-// (x + c1) * c2, (c1 - x) * c2, where the constant product loses nothing.
+// (x + c1) * c2, (c1 - x) * c2, where neither product loses anything.
 NODE* distribute(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     if (!is_icon(t->right) || (inner->op != PLUS && inner->op != MINUS) || !operands_have_type(inner)) return nullptr;
@@ -122,6 +133,7 @@ NODE* distribute(NODE* t, struct LOOP* loop) {
     const INT65 product = c1->u.lval * t->right->u.lval;
     if (!in_type(product, t->type)) return nullptr;
     NODE* x = on_right ? inner->left : inner->right;
+    if (!signed_result_is_exact(MULT, x, t->right, t->type, loop)) return nullptr;
     set_icon(c1, product);
     NODE* scaled = made(MULT, x, t->right, t->type, loop);
     (on_right ? inner->left : inner->right) = scaled;
@@ -232,7 +244,9 @@ NODE* divide_negations(NODE* t, struct LOOP* loop) {
         return simp_node(t, loop);
     }
     const bool negative_left = is_negatable_constant(l) || (is_unary(l, UMINUS) && negates_exactly(l->left, loop));
-    const bool negative_right = is_negatable_constant(r) || (is_unary(r, UMINUS) && negates_exactly(r->left, loop));
+    // Of a divisor the sign counts too: it may become -1, for which the least number has no quotient.
+    const bool negative_right =
+        is_negatable_constant(r) || (is_unary(r, UMINUS) && negates_exactly(r->left, loop) && negates_exactly(l, loop));
     if (!negative_left && !negative_right) return nullptr;
     auto negate = [](NODE* x) {
         if (!is_icon(x)) return take_left(x);

@@ -34,8 +34,9 @@ RANGE range_of_type(const TYPE* t);
 // What is left of exact results from `min` to `max` once they are wrapped into the type.
 RANGE wrapped(WIDE min, WIDE max, const TYPE* t);
 RANGE range_of_tree(const NODE* tree, struct LOOP* loop); // of a tree whose type has a range
-// Whether an operation over exact operands (PLUS, MINUS, MULT, UMINUS, SLL by a constant) stays within its type.
+// Whether an operation over exact operands (PLUS, MINUS, MULT, UMINUS, SLL) stays within its type.
 bool operation_is_exact(const NODE* tree, struct LOOP* loop);
+bool operation_is_exact(int op, const NODE* a, const NODE* b, const TYPE* type, struct LOOP* loop); // b null for UMINUS
 
 // Calls `visit(condition, holds)` for conditions known in the loop and those around it, or in the function; of a
 // conjunction for its parts. `holds` tells whether the condition or its opposite is known.

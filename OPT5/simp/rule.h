@@ -34,6 +34,8 @@ inline bool is_icon(const NODE* t, INT65 v) { return t->op == ICON && t->u.lval 
 inline uint64_t bits_of(const NODE* icon) { return icon->u.lval.value & mask_of(icon->type); }
 inline bool is_all_ones(const NODE* t) { return t->op == ICON && bits_of(t) == mask_of(t->type); }
 inline void set_icon(NODE* t, INT65 v) { t->u.lval = truncate_to_type(v, t->type); }
+// Whether a constant of the type is the number, or computes as well without being it.
+inline bool fits_or_wraps(INT65 v, TYPE* type) { return !is_signed(type) || truncate_to_type(v, type) == v; }
 inline NODE* icon_of(INT65 v, const NODE* like) {
     NODE* t = mk_ICON(v, like->type->stqs());
     t->ls = like->ls;

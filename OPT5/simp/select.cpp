@@ -5,6 +5,7 @@
 // arms in their order. A cast that the operand's bits or the use of the result make idle is gone.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/minmax.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
@@ -259,7 +260,7 @@ NODE* absolute_value(NODE* t, struct LOOP* loop) {
     TYPE* type = t->type;
     erase_tree(t);
     x = made(ABS, x, nullptr, type, loop);
-    return negates ? x : made(UMINUS, x, nullptr, type, loop);
+    return negates ? x : made_exact(UMINUS, x, nullptr, type, loop);
 }
 
 // The test of a minimum or maximum: a < b ? a : b, a > b ? a : b, whatever it was.

@@ -2,6 +2,7 @@
 // a mask or a pair of casts.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
@@ -91,7 +92,8 @@ NODE* shift_product(NODE* t, struct LOOP* loop) {
     const int n = shift_count_of(t);
     if (!n || t->op != SLL || !is_node_with_icon(t->left, MULT)) return nullptr;
     set_icon(t->left->right, t->left->right->u.lval << INT65(n));
-    return simp_node(only_left(t), loop);
+    erase_node(t->right);
+    return kept_exact(take_left(t), loop);
 }
 
 // What is shifted out need not be computed.

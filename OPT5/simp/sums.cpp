@@ -5,6 +5,7 @@
 // product; a sum with a negation is a difference. Pointers: the pointer stands on the left, the constant outermost.
 
 #include "OPT5/simp/algebra.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
@@ -17,9 +18,13 @@ namespace {
 bool is_sum(const NODE* t) { return (t->op == PLUS || t->op == MINUS) && operands_have_type(t); }
 bool has_constant_term(const NODE* t) { return is_sum(t) && is_icon(t->right); }
 INT65 constant_term(const NODE* t) { return t->op == PLUS ? t->right->u.lval : -t->right->u.lval; }
-bool fits_or_wraps(INT65 v, TYPE* type) { return type->is_unsigned() || truncate_to_type(v, type) == v; }
+// A constant among the terms, also behind a cast from the unsigned type, where it is out of the sum's reach.
+bool holds_constant(const NODE* t) {
+    if (t->op == SCONV && is_integer(t->left->type) && t->left->type->size == t->type->size) t = t->left;
+    return is_sum(t) && (is_icon(t->right) || is_icon(t->left));
+}
 
-// The node as x + c, in the form that the sign of the type wants.
+// The node as x + c of a c that fits or wraps, in the form that the sign of the type wants.
 NODE* as_constant_sum(NODE* t, NODE* x, INT65 c, NODE* icon) {
     TYPE* type = t->type;
     c = truncate_to_type(c, type);
@@ -36,7 +41,7 @@ NODE* drop_zero(NODE* t, struct LOOP*) {
 }
 
 NODE* canonical_constant(NODE* t, struct LOOP* loop) {
-    if (!is_icon(t->right)) return nullptr;
+    if (!is_icon(t->right) || !fits_or_wraps(constant_term(t), t->type)) return nullptr;
     const int op = t->op;
     as_constant_sum(t, t->left, constant_term(t), t->right);
     return t->op != op ? simp_node(t, loop) : nullptr;
@@ -83,7 +88,7 @@ NODE* constant_minus_sum(NODE* t, struct LOOP* loop) {
     return simp_node(as_constant_sum(t, x, c, t->left), loop);
 }
 
-// (x + c) op y and x op (y + c): the constant moves outward.
+// (x + c) op y and x op (y + c): the constant moves outward, where what is left is exact.
 NODE* constant_outward(NODE* t, struct LOOP* loop) {
     if (is_icon(t->right)) return nullptr;
     const bool on_left = has_constant_term(t->left);
@@ -91,10 +96,22 @@ NODE* constant_outward(NODE* t, struct LOOP* loop) {
     NODE* inner = on_left ? t->left : t->right;
     INT65 c = constant_term(inner);
     if (!on_left && t->op == MINUS) c = -c;
-    NODE *x = inner->left, *icon = inner->right;
+    NODE *x = inner->left, *icon = inner->right, *a = on_left ? x : t->left, *b = on_left ? t->right : x;
+    if (!fits_or_wraps(c, t->type) || !signed_result_is_exact(t->op, a, b, t->type, loop)) return nullptr;
     erase_node(inner);
-    NODE* sum = on_left ? made(t->op, x, t->right, t->type, loop) : made(t->op, t->left, x, t->type, loop);
-    return simp_node(as_constant_sum(t, sum, c, icon), loop);
+    return simp_node(as_constant_sum(t, made(t->op, a, b, t->type, loop), c, icon), loop);
+}
+
+// (x + c1) op (y + c2), ((x + c1) op y) + c2: where the constants can't come together in signed sums, they do in
+// unsigned ones.
+NODE* join_distant_constants(NODE* t, struct LOOP* loop) {
+    if (!is_signed(t->type)) return nullptr;
+    auto holds_two = [](const NODE* n) { return holds_constant(n->left) && holds_constant(n->right); };
+    const NODE* inner = t->left;
+    const bool below =
+        is_icon(t->right) && is_sum(inner) && (holds_constant(inner->left) || holds_constant(inner->right));
+    const bool under_cast = is_icon(t->right) && inner->op == SCONV && holds_constant(inner);
+    return holds_two(t) || below || under_cast ? as_wrapping(t, loop) : nullptr;
 }
 
 // ---- Negations
@@ -116,7 +133,7 @@ NODE* remove_negations(NODE* t, struct LOOP* loop) {
     // x - (y - z) of a constant y is (x + z) - y.
     NODE* inner = t->right;
     if (t->op == MINUS && inner->op == MINUS && is_icon(inner->left) && operands_have_type(inner) &&
-        !is_icon(t->left)) {
+        !is_icon(t->left) && signed_result_is_exact(PLUS, t->left, inner->right, t->type, loop)) {
         NODE* sum = made(PLUS, t->left, inner->right, t->type, loop);
         NODE* c = inner->left;
         erase_node(inner);
@@ -132,7 +149,7 @@ NODE* keep_term(NODE* t, NODE* holder, bool left, bool negative, struct LOOP* lo
     if (left) std::swap(holder->left, holder->right); // a node's only operand is its left one
     TYPE* type = t->type;
     erase_tree(t);
-    return negative ? made(UMINUS, kept, nullptr, type, loop) : kept;
+    return negative ? made(UMINUS, kept, nullptr, type, loop) : kept; // the number that the sum was
 }
 
 // The term that is left may have effects of its own only where it is not evaluated between the two that cancel.
@@ -172,10 +189,13 @@ NODE* join_equal_terms(NODE* t, struct LOOP* loop) {
     const TERM l = term_of(t->left), r = term_of(t->right);
     if (!same_value(l.value, r.value)) return nullptr;
     const INT65 factor = t->op == PLUS ? l.factor + r.factor : l.factor - r.factor;
+    if (!fits_or_wraps(factor, t->type)) return nullptr;
+    const bool shifts = t->left->op == SLL || t->right->op == SLL; // which wrap where a product may not
     NODE *x = copy_tree(l.value), *icon = icon_of(factor, t);
+    icon->u.lval = truncate_to_type(factor, t->type);
     TYPE* type = t->type;
     erase_tree(t);
-    return made(MULT, x, icon, type, loop);
+    return shifts ? made_exact(MULT, x, icon, type, loop) : made(MULT, x, icon, type, loop);
 }
 
 NODE* factor_out(NODE* t, struct LOOP* loop) {
@@ -186,11 +206,13 @@ NODE* factor_out(NODE* t, struct LOOP* loop) {
         if (is_icon(a) || !same_value(a, b)) continue;
         NODE *common = a, *x = side & 1 ? l->left : l->right, *y = side & 2 ? r->left : r->right;
         if (is_icon(x) != is_icon(y)) return nullptr; // x * c + x * y stays for the pairs of constants
+        const bool is_exact = signed_result_is_exact(t->op, x, y, t->type, loop);
         erase_tree(b);
         erase_node(l);
         erase_node(r);
-        NODE* sum = made(t->op, x, y, t->type, loop);
-        return simp_node(to_binary(t, MULT, common, sum), loop);
+        NODE* sum = maketree(t->op, x, y, t->type, t->ls);
+        if (is_exact) return simp_node(to_binary(t, MULT, common, simp_node(sum, loop)), loop);
+        return as_wrapping(to_binary(t, MULT, common, sum), loop);
     }
     return nullptr;
 }
@@ -201,8 +223,10 @@ NODE* sum_with_complement(NODE* t, struct LOOP* loop) {
     const bool adds = t->op == PLUS && is_icon(t->right) && is_unary(t->left, NOTB);
     const bool subtracts = t->op == MINUS && is_icon(t->left) && is_unary(t->right, NOTB);
     if (!adds && !subtracts) return nullptr;
-    NODE *icon = adds ? t->right : t->left, *x = take_left(adds ? t->left : t->right);
+    NODE* icon = adds ? t->right : t->left;
     const INT65 c = icon->u.lval + (adds ? INT65(-1) : INT65(1));
+    if (!fits_or_wraps(c, t->type)) return nullptr;
+    NODE* x = take_left(adds ? t->left : t->right);
     if (!adds) return simp_node(as_constant_sum(t, x, c, icon), loop);
     set_icon(icon, c);
     return simp_node(to_binary(t, MINUS, icon, x), loop);
@@ -269,9 +293,10 @@ NODE* sum_of_masked(NODE* t, struct LOOP* loop) {
     return simp_node(only_left(t), loop);
 }
 
-const RULE sum_rules[] = {drop_zero,    canonical_constant, join_constants,   constant_minus_sum, remove_negations,
-                          cancel_terms, constant_outward,   join_equal_terms, factor_out,         sum_with_complement,
-                          sum_of_bits,  sum_of_masked,      remainder};
+const RULE sum_rules[] = {drop_zero,        canonical_constant, join_constants,      constant_minus_sum,
+                          remove_negations, cancel_terms,       constant_outward,    join_distant_constants,
+                          join_equal_terms, factor_out,         sum_with_complement, sum_of_bits,
+                          sum_of_masked,    remainder};
 
 NODE* simp_integer_sum(NODE* t, struct LOOP* loop) {
     if (!operands_have_type(t)) return t;
@@ -381,7 +406,7 @@ const NODE* base_of(const NODE* t) {
 
 NODE* offset_as_long(NODE* sum, struct LOOP* loop) {
     NODE* offset = coerced(tp->long_t, copy_tree(sum->right), loop);
-    return sum->op == MINUS ? made(UMINUS, offset, nullptr, tp->long_t, loop) : offset;
+    return sum->op == MINUS ? made_exact(UMINUS, offset, nullptr, tp->long_t, loop) : offset;
 }
 
 // (p + i) - (p + j) is i - j; (p + c) - q is (p - q) + c.
@@ -395,11 +420,11 @@ NODE* simp_pointer_difference(NODE* t, struct LOOP* loop) {
     TYPE* type = t->type;
     NODE* value = nullptr;
     if (l_is_sum && r_is_sum && same_value(base_of(l->left), base_of(r->left)))
-        value = made(MINUS, offset_as_long(a, loop), offset_as_long(b, loop), tp->long_t, loop);
+        value = made_exact(MINUS, offset_as_long(a, loop), offset_as_long(b, loop), tp->long_t, loop);
     else if (l_is_sum && same_value(base_of(l->left), r))
         value = offset_as_long(a, loop);
     else if (r_is_sum && same_value(l, base_of(r->left)))
-        value = made(UMINUS, offset_as_long(b, loop), nullptr, tp->long_t, loop);
+        value = made_exact(UMINUS, offset_as_long(b, loop), nullptr, tp->long_t, loop);
     if (value) {
         erase_tree(t);
         return coerce_to_type(type, value);

@@ -417,22 +417,26 @@ RANGE range_of_tree(const NODE* tree, struct LOOP* loop) {
 }
 
 bool operation_is_exact(const NODE* t, struct LOOP* loop) {
-    if (!has_value_range(t->left->type) || (t->right && !has_value_range(t->right->type))) return false;
-    const RANGE limits = range_of_type(t->type);
-    const RANGE a = range_of_tree(t->left, loop);
+    return operation_is_exact(t->op, t->left, t->right, t->type, loop);
+}
+
+bool operation_is_exact(int op, const NODE* x, const NODE* y, const TYPE* type, struct LOOP* loop) {
+    if (!has_value_range(x->type) || (y && !has_value_range(y->type))) return false;
+    const RANGE limits = range_of_type(type);
+    const RANGE a = range_of_tree(x, loop);
     auto fits = [&](WIDE low, WIDE high) { return limits.min <= low && high <= limits.max; };
-    if (t->op == UMINUS) return fits(-a.max, -a.min);
-    const RANGE b = range_of_tree(t->right, loop);
-    switch (t->op) {
+    if (op == UMINUS) return fits(-a.max, -a.min);
+    const RANGE b = range_of_tree(y, loop);
+    switch (op) {
     case PLUS: return fits(a.min + b.min, a.max + b.max);
     case MINUS: return fits(a.min - b.max, a.max - b.min);
     case MULT:
     case SLL: {
-        if (t->op == SLL && (b.min < 0 || b.max >= static_cast<WIDE>(t->type->size))) return false;
-        const bool shifts = t->op == SLL;
-        for (WIDE x : {a.min, a.max})
-            for (WIDE y : {b.min, b.max}) {
-                const WIDE p = times(x, shifts ? WIDE(1) << static_cast<int>(y) : y);
+        if (op == SLL && (b.min < 0 || b.max >= static_cast<WIDE>(type->size))) return false;
+        const bool shifts = op == SLL;
+        for (WIDE v : {a.min, a.max})
+            for (WIDE w : {b.min, b.max}) {
+                const WIDE p = times(v, shifts ? WIDE(1) << static_cast<int>(w) : w);
                 if (!fits(p, p)) return false;
             }
         return true;

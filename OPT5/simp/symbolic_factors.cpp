@@ -4,6 +4,7 @@
 // divisors come out right.
 
 #include "OPT5/ir/trees.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/factor.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/linear.h"
@@ -86,7 +87,8 @@ private:
     // The factor of an operator's exact result, for the value that the operator gives.
     FACTOR of_result(const NODE* t, FACTOR f) {
         if (power_of_2_in(f) == f && trailing_zeros(f) < t->type->size) return f;
-        if (f && ((trusts_signed && wraps_signed(t->type)) || (--ranges_left >= 0 && operation_is_exact(t, loop))))
+        if (f && ((trusts_signed && is_exact_by_rule(t->op, t->type)) ||
+                  (--ranges_left >= 0 && operation_is_exact(t, loop))))
             return f;
         return after_wrap(f, static_cast<unsigned>(t->type->size));
     }

@@ -321,6 +321,8 @@ FINDING TRIAL::check(const OPERATION& op) const {
             report("effects" + event_text(e.events) + " for" + event_text(r.events), r.assignment);
         else if (e.memory != r.memory)
             report("another content of memory", r.assignment);
+        else if (e.overflowed && !r.overflowed)
+            report("a signed operation overflows that did not", r.assignment);
     }
     if (result) erase_tree(result);
     return finding;

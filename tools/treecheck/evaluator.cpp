@@ -289,8 +289,6 @@ BITS EVALUATOR::arithmetic(int op, BITS a, const FORM& fa, BITS b, const FORM& f
         if (static_cast<int64_t>(b) < 0 || b >= static_cast<BITS>(f.bits)) return fail();
         const BITS v = op == SLL ? a << b : f.is_signed ? static_cast<BITS>(static_cast<int64_t>(a) >> b) : a >> b;
         const BITS held = wrap(v, f);
-        const auto back = op == SLL ? static_cast<BITS>(static_cast<int64_t>(held) >> b) : a;
-        overflowed |= f.is_signed && back != a;
         return convert(held, f, to);
     }
     const FORM f = usual(fa, fb);

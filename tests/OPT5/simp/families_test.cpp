@@ -161,7 +161,7 @@ TEST_F(Families, AssignmentsThatWriteMembersAndMemory) {
         {set(x(), set(x(), y())), "x = y"},
         {set(x(), bin(PLUS, bin(PLUS, y(), x()), u(), tp->int_t)), "x = y + x + u"}, // of two types
         {set(x(), bin(PLUS, bin(MINUS, y(), name(zs)), x())), "x += y - z"},
-        {set(x(), bin(MINUS, bin(MINUS, x(), y()), name(zs))), "x -= y + z"},
+        {set(x(), bin(MINUS, bin(MINUS, x(), y()), name(zs))), "x = x - y - z"},
         {set(x(), bin(MINUS, y(), x())), "x = y - x"},
         {set(x(), bin(ORB, bin(ORB, y(), x()), name(zs))), "x |= y | z"},
         {set(x(), bin(PLUS, y(), icon(1))), "x = y + 1"},
@@ -218,16 +218,17 @@ TEST_F(Families, RelaxedFloatingPointAndPowers) {
 
 TEST_F(Families, TermsAreBroughtToTheTop) {
     NODE* target = x();
+    auto bits = [](NODE* a) { return bin(ANDB, a, icon(7)); };
     struct CASE {
         NODE* tree;
         const char* expected;
     } cases[] = {
         {bin(PLUS, y(), x()), "x + y"},
-        {bin(PLUS, bin(PLUS, y(), x()), name(zs)), "x + (y + z)"},
-        {bin(MINUS, bin(MINUS, x(), y()), name(zs)), "x - (y + z)"},
-        {bin(PLUS, bin(MINUS, x(), y()), name(zs)), "x - (y - z)"},
-        {bin(PLUS, y(), bin(MINUS, x(), name(zs))), "x + (y - z)"},
-        {bin(MULT, y(), bin(MULT, name(zs), x())), "x * (y * z)"},
+        {bin(PLUS, bin(PLUS, bits(y()), x()), bits(name(zs))), "x + ((y & 7) + (z & 7))"},
+        {bin(MINUS, bin(MINUS, x(), bits(y())), bits(name(zs))), "x - ((y & 7) + (z & 7))"},
+        {bin(PLUS, bin(MINUS, x(), y()), name(zs)), "x - y + z"}, // y - z may overflow
+        {bin(PLUS, bits(y()), bin(MINUS, x(), bits(name(zs)))), "x + ((y & 7) - (z & 7))"},
+        {bin(MULT, bits(y()), bin(MULT, bits(name(zs)), x())), "x * ((y & 7) * (z & 7))"},
         {bin(MINUS, y(), x()), "y - x"},
         {bin(PLUS, f(), x()), "f() + x"},
     };
@@ -246,7 +247,7 @@ TEST_F(Families, ChainsAreReassociated) {
         NODE* tree;
         const char* expected;
     } cases[] = {
-        {sum(sum(sum(x(), y()), icon(3)), sum(x(), icon(4))), "x * 2 + y + 7"},
+        {sum(sum(sum(x(), y()), icon(3)), sum(x(), icon(4))), "(int)((unsigned int)x * 2u + (unsigned int)y + 7u)"},
         {bin(MINUS, sum(sum(x(), y()), name(zs)), x()), "y + z"},
         {bin(XORB, bin(XORB, bin(XORB, x(), y()), name(zs)), y()), "x ^ z"},
         {bin(ANDB, bin(ANDB, x(), y()), x()), "x & y"},
@@ -271,7 +272,7 @@ TEST_F(Families, OnlyTheBitsThatMatterAreComputed) {
         {bin(ANDB, x(), icon(255)), 15, "x"},
         {bin(ANDB, x(), icon(7)), 15, "x & 7"},
         {bin(ORB, x(), icon(16)), 15, "x"},
-        {bin(PLUS, bin(ANDB, x(), icon(255)), bin(ORB, y(), icon(256))), 15, "x + y"},
+        {bin(PLUS, bin(ANDB, x(), icon(255)), bin(ORB, y(), icon(256))), 15, "(int)((unsigned int)x + (unsigned int)y)"},
         {bin(SRL, bin(ANDB, u(), icon(0xFF0, tp->uint_t)), icon(4), tp->uint_t), 15, "u >> 4"},
         {bin(SRL, bin(ORB, x(), icon(-32768)), icon(4), tp->int_t), 0xF000, "(x | -32768) >> 4"}, // copies of the sign
         {bin(DIV, bin(ANDB, x(), icon(255)), icon(3)), 1, "(x & 255) / 3"},

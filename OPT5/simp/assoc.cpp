@@ -50,8 +50,13 @@ public:
     // Sums are built from positive terms to negative ones, the constant last. What the last operator gives is the
     // number that the chain gave, if all before it is exact.
     NODE* build(struct LOOP* loop) {
-        for (const OPERAND& o : operands) operators_left += o.value ? 1 + (magnitude(o) != INT65(1)) : 0;
-        operators_left += (constants ? 1 : 0) - 1;
+        bool begins_negated = true; // one operator more, unless it is the factor
+        for (const OPERAND& o : operands) {
+            if (!o.value) continue;
+            operators_left += 1 + (magnitude(o) != INT65(1));
+            begins_negated = begins_negated && is_negative(o);
+        }
+        operators_left += (constants ? 1 : 0) + (begins_negated ? 1 : 0) - 1;
         NODE* chain = nullptr;
         for (bool negative : {false, true})
             for (OPERAND& o : operands)

@@ -367,6 +367,29 @@ NODE* offset_outward(NODE* t, struct LOOP* loop) {
     return made(PLUS, simp_node(t, loop), mk_ICON(c, offset), type, loop);
 }
 
+// p + (x + c) * k, p + ((x + c) + y), in the width of an address: the constant moves outward. What a pointer is moved
+// by lies within an object, which is smaller than FAR, and so what is left of it without a constant below FAR is exact.
+constexpr int64_t FAR = int64_t(1) << 30;
+
+NODE* constant_of_offset_outward(NODE* t, struct LOOP* loop) {
+    NODE* r = t->right;
+    if (r->type->size != tp->void_ptr_t->size || !is_signed(r->type) || !r->right || !operands_have_type(r))
+        return nullptr;
+    const bool scales = is_node_with_icon(r, MULT) && has_constant_term(r->left);
+    const bool on_left = is_sum(r) && has_constant_term(r->left), on_right = is_sum(r) && has_constant_term(r->right);
+    if (!scales && !on_left && !on_right) return nullptr;
+    NODE*& place = scales || on_left ? r->left : r->right;
+    INT65 c = constant_term(place);
+    if (scales) c = c * r->right->u.lval;
+    if ((t->op == MINUS) != (!scales && !on_left && r->op == MINUS)) c = -c;
+    if (c >= INT65(FAR) || c <= INT65(-FAR)) return nullptr;
+    erase_node(place->right);
+    place = take_left(place);
+    t->right = simp_node(r, loop);
+    TYPE* type = t->type;
+    return made(PLUS, simp_node(t, loop), mk_ICON(c, tp->long_t), type, loop);
+}
+
 // The pointer on the left, a positive operator where that is one: i + p, p + -i, p - c.
 NODE* canonical_pointer_sum(NODE* t, struct LOOP* loop) {
     if (t->op == PLUS && t->right->type->is_pointer() && is_offset(t->left->type)) {
@@ -396,7 +419,7 @@ NODE* canonical_pointer_sum(NODE* t, struct LOOP* loop) {
     return nullptr;
 }
 
-const RULE pointer_rules[] = {canonical_pointer_sum, join_offsets, offset_outward};
+const RULE pointer_rules[] = {canonical_pointer_sum, join_offsets, offset_outward, constant_of_offset_outward};
 
 // ---- Differences of pointers, in address units
 const NODE* base_of(const NODE* t) {

@@ -296,6 +296,9 @@ BITS EVALUATOR::arithmetic(int op, BITS a, const FORM& fa, BITS b, const FORM& f
     b = convert(b, fb, f);
     if (undefined) return 0;
     const BITS base = fa.is_pointer ? a : fb.is_pointer ? b : 0;
+    // What a pointer is moved by stays within an object. A rewritten tree gets there by other steps.
+    const auto by = static_cast<int32_t>(fa.is_pointer && !fb.is_pointer ? b : fb.is_pointer && !fa.is_pointer ? a : 0);
+    overflowed |= !null_is_passed && (by >= 1 << 30 || by < -(1 << 30));
     if (base && !null_is_passed && wrap(integer(op, a, b, f), f) == 0 && !(fa.is_pointer && fb.is_pointer))
         return fail(); // no place in an object has the address null
     if (f.is_float) return convert(rounded(operate(op, as_double(a), as_double(b)), f), f, to);

@@ -62,7 +62,7 @@ void add_synonym_edges() {
         for (const PRAGMA* p = s->pragma; p; p = p->next) {
             if (p->kind != PRG_FUNC_SYNONYM || p->args.empty()) continue;
             FUNINFO* target = make_FUNINFO(skip_name_prefix(p->args[0].c_str()));
-            if (!function_is_defined(target)) continue;
+            if (!target->symbol || !function_is_defined(target)) continue;
             if (function_is_defined(f))
                 add_call_edge(f, target, false);
             else

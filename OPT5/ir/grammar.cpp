@@ -193,6 +193,123 @@ void check_operands(const NODE* t) {
     }
 }
 
+// ---- Types of operands
+
+// What an operator can compute with.
+bool is_operand_type(const TYPE* t) {
+    return t->is_scalar() || t->is_vector() || t->is_complex() || (t->is_csu() && t->is_struct_vector());
+}
+
+void check_type(const NODE* t, const NODE* of, bool fits) {
+    if (!fits) refuse(std::string(opname(of->op)) + (t == of ? " of type " : " of what has type ") + t->type->printstr());
+}
+
+bool is_truth_type(const TYPE* t) { return t->is_int() || t->is_enum() || t->is_vector(); }
+
+void check_comparison(const NODE* t) {
+    check_type(t, t, is_truth_type(t->type));
+    const bool equality = t->op == EQ || t->op == NEQ || t->op == FEQ || t->op == FNEQ || t->op == FEQN || t->op == FNEQN;
+    for (const NODE* n : {t->left, t->right})
+        check_type(n, t, is_operand_type(n->type) && (equality || !n->type->is_complex()));
+}
+
+// Parts of complex numbers and lanes of vectors are never dropped by an operator.
+void check_arithmetic(const NODE* t, bool integers) {
+    auto fits = [integers](const TYPE* type) {
+        return is_operand_type(type) && !(integers && (type->is_float() || type->is_complex()));
+    };
+    check_type(t, t, fits(t->type));
+    for (const NODE* n : {t->left, t->right}) {
+        if (!n) continue;
+        check_type(n, t, fits(n->type));
+        if (n->type->is_complex()) check_type(t, t, t->type->is_complex());
+        if (n->type->is_vector()) check_type(t, t, t->type->is_vector());
+    }
+}
+
+bool is_place(const NODE* t) {
+    switch (t->op) {
+    case NAME:
+    case STDOT:
+    case STREF:
+    case UMULT:
+    case VFIELD:
+    case REAL:
+    case IMAG:
+    case VREG: return true;
+    case SCONV:
+    case PCONV:
+    case ACONV:
+    case VRCONV:
+    case EPVAL:
+    case DDNODE: return is_place(t->left);
+    case COMMAOP:
+    case PCOMMA: return is_place(t->right);
+    default: return false;
+    }
+}
+
+// Whether values of one type are kept as those of the other are, but for sizes.
+bool same_kind(const TYPE* a, const TYPE* b) {
+    auto kind = [](const TYPE* t) {
+        return t->is_pointer() ? 1 : t->is_complex() ? 2 : t->is_vector() ? 3 : t->is_csu() ? 4 : t->is_array() ? 5
+             : t->is_func() ? 6 : t->is_void() ? 7 : t->is_float() ? 8 : 0;
+    };
+    return kind(a) == kind(b);
+}
+
+void check_name(const NODE* t) {
+    const TYPE* object = t->u.sym->type;
+    const bool fits = same_kind(t->type, object) && (!object->is_scalar() || t->type->size == object->size);
+    if (!in_graph && t->u.sym->level > 0 && t->u.sym->sclass == SC_DROPPED)
+        refuse(std::string(t->u.sym->name) + " is named and has no storage");
+    if (!fits) refuse(std::string(t->u.sym->name) + " named as of type " + t->type->printstr());
+}
+
+// What is assigned may be of another type than the place, but not of another kind.
+void check_assignment(const NODE* t) {
+    const TYPE *to = t->left->type, *from = t->right->type;
+    if (!is_place(t->left)) refuse(std::string(opname(t->op)) + " to what is no place");
+    if (t->op == STASG || t->op == ARASG) return;
+    check_type(t, t, same_kind(t->type, to) || t->type->is_void());
+    check_type(t->right, t, is_operand_type(from) == is_operand_type(to));
+    check_type(t->right, t, !(from->is_pointer() && to->is_complex()) && !(from->is_complex() && to->is_pointer()));
+}
+
+void check_types(const NODE* t) {
+    if ((t->op >= EQ && t->op <= UGT) || (t->op >= FEQ && t->op <= FUNO)) return check_comparison(t);
+    switch (t->op) {
+    case ANDAND:
+    case OROR:
+    case EXCLAIM: return check_type(t, t, is_truth_type(t->type));
+    case PLUS:
+    case MINUS:
+    case MULT:
+    case DIV:
+    case UMINUS:
+    case ABS:
+    case SQR:
+    case SQRT:
+    case RECIP: return check_arithmetic(t, false);
+    case MOD:
+    case ANDB:
+    case ORB:
+    case XORB:
+    case NOTB:
+    case SLL:
+    case SRL: return check_arithmetic(t, true);
+    case COMPLEX:
+        check_type(t, t, t->type->is_complex());
+        for (const NODE* n : {t->left, t->right}) check_type(n, t, n->type->is_scalar() && !n->type->is_complex());
+        return;
+    case REAL:
+    case IMAG: return check_type(t->left, t, t->left->type->is_complex() || t->left->type->is_vector());
+    case SCONV: return check_type(t->left, t, is_operand_type(t->left->type));
+    default:
+        if (opcode_is_ASG(t->op)) check_assignment(t);
+    }
+}
+
 void check_constant(const NODE* t) {
     const TYPE* type = t->type->is_vector() ? t->type->raw_elem_type() : t->type;
     const bool integer = type->is_int() || type->is_enum() || type->is_pointer() || type->is_fixed();
@@ -205,6 +322,7 @@ void check_value(const NODE* t, ROLE role) {
     switch (t->op) {
     case NAME:
         if (!t->u.sym) refuse("a NAME without a symbol");
+        check_name(t);
         break;
     case ICON:
     case FCON: check_constant(t); break;
@@ -212,6 +330,7 @@ void check_value(const NODE* t, ROLE role) {
     default: break;
     }
     check_operands(t);
+    check_types(t);
 }
 
 void check(const NODE* t, ROLE role) {

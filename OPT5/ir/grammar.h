@@ -2,7 +2,8 @@
 //
 // The I-file's records fix how many operands a node has, not what they are. What is refused is what no parser writes and
 // what the optimizer could only misread: a label used as a value, a case outside a switch, an indirection through what is
-// no pointer. Behind the check of the input the walkers of the optimizer rely on the shapes, and validation between the
+// no pointer, a sum of structures. Operands may have other types than their operator, since parsers leave casts out; but
+// what no cast could make of them is refused. Behind the check of the input the walkers of the optimizer rely on the shapes, and validation between the
 // rows of the pipeline holds every pass to them.
 #pragma once
 

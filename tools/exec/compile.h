@@ -68,10 +68,11 @@ struct PROGRAM {
         records.push_back(record);
         return record.get();
     }
+    static int64_t refused(const XNODE* x, MACHINE& m);
     XNODE* node(EVAL run, const XNODE* a = nullptr, const XNODE* b = nullptr, int64_t k = 0) {
         nodes.emplace_back();
         XNODE* x = &nodes.back();
-        x->run = run;
+        x->run = run ? run : refused; // no form of the operation for such operands
         x->a = a;
         x->b = b;
         x->k = k;

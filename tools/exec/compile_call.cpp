@@ -84,6 +84,7 @@ const XNODE* COMPILER::finish(CALL_SITE& site, EVAL eval) {
 }
 
 const XNODE* COMPILER::call(const IC_NODE* n) {
+    if (!f) return unsupported(n); // no function runs before all are compiled
     CALL_SITE& site = *p.make<CALL_SITE>();
     site.result = shape_of(n->type);
     const IC_NODE* callee = strip_marks(n->left);
@@ -109,6 +110,7 @@ const XNODE* COMPILER::call(const IC_NODE* n) {
 }
 
 const XNODE* COMPILER::intrinsic(const IC_NODE* n) {
+    if (!f) return unsupported(n);
     CALL_SITE& site = *p.make<CALL_SITE>();
     site.result = shape_of(n->type);
     site.name = n->op == op::MEMCPY ? "memcpy" : n->text;

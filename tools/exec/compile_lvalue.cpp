@@ -32,6 +32,7 @@ int64_t compound_eval(const XNODE* x, MACHINE& m) {
 } // namespace
 
 int64_t COMPILER::slot(uint64_t units) {
+    if (!f) p.m.fail(EXEC_UNSUPPORTED, "an initializer needs a frame");
     f->frame = (f->frame + units + 3) & ~uint64_t{3};
     return -static_cast<int64_t>(f->frame);
 }

@@ -83,7 +83,10 @@ private:
                 p.m.store(shape_of(element), at + i * stride, static_cast<unsigned char>(text->text[i]));
             return;
         }
-        for (uint64_t i = 0; i < count && !done(); i++) object(element, at + i * stride);
+        for (uint64_t i = 0; i < count && !done(); i++) {
+            p.m.check(at + i * stride, 0);
+            object(element, at + i * stride);
+        }
     }
     void structure(TYPE* t, uint64_t at) {
         for (const fkMDATA* m = t->mdata(); m && !done(); m = m->next) {
@@ -96,6 +99,10 @@ private:
     }
 };
 } // namespace
+
+int64_t PROGRAM::refused(const XNODE*, MACHINE& m) {
+    m.fail(EXEC_UNSUPPORTED, "cannot execute an operation on operands of such types");
+}
 
 uint64_t PROGRAM::take(uint64_t units, uint64_t align_mask) {
     next = (next + align_mask) & ~align_mask;
@@ -115,7 +122,30 @@ std::string PROGRAM::bare(const char* name) const {
     return name_prefix && (*name == '_' || *name == '.') ? name + 1 : name;
 }
 
+// A node or symbol without a type number is of no type, and everything asks for one.
+static void give_types(const IC_UNIT& unit) {
+    TYPE* const none = tp->mk_void();
+    auto tree = [none](auto&& self, IC_NODE* n) -> void {
+        for (; n; n = n->right) {
+            if (!n->type) n->type = none;
+            self(self, n->left);
+        }
+    };
+    auto symbol = [none](IC_SYMBOL* s) {
+        if (!s->type) s->type = none;
+    };
+    for (const IC_ITEM& item : unit.items)
+        if (item.kind == IFR_EXPR) tree(tree, item.tree);
+    for (IC_SYMBOL* s : unit.globals) {
+        symbol(s);
+        for (IC_NODE* n : s->init) tree(tree, n);
+    }
+    for (const IC_FUNC& f : unit.functions)
+        for (IC_SYMBOL* s : f.locals) symbol(s);
+}
+
 void PROGRAM::lay_out() {
+    give_types(unit);
     m.size = options.max_memory;
     m.memory.assign(m.size, 0);
     std::map<std::string, FUNCTION*> defined;

@@ -247,6 +247,50 @@ TEST_F(ShapeTest, ConstantsHaveTheirKindOfType) {
     refuses(node(op::ASG, i, name(x), icon(1, pkg.float_t)), "a constant ICON of type float");
 }
 
+// What no cast makes of an operand is refused; that a parser left a cast out is not.
+TEST(Shapes, OperatorsHaveOperandsThatTheyCanComputeWith) {
+    struct UNIT : UnitTest {
+        void TestBody() override {}
+        std::string error(int opcode, const char* type, const char* left, const char* right) {
+            const std::map<std::string, TYPE*> types = {
+                {"int", pkg.int_t}, {"float", pkg.float_t}, {"function", int_fn}, {"pointer", pkg.mk_ptr(pkg.int_t)},
+                {"complex", pkg.mk_complex(pkg.float_t)}};
+            std::map<std::string, IC_SYMBOL*> objects;
+            for (const auto& [text, t] : types) objects[text] = global("_" + text, t, text == "function" ? 5 : 2);
+            begin_main();
+            IC_NODE* const second = *right ? name(objects.at(right)) : nullptr;
+            statement(node(opcode, types.at(type), opcode == op::ASG && !*left ? icon(1) : name(objects.at(left)), second));
+            ret(icon(0));
+            end();
+            const RESULT r = optimize();
+            return r.status == 0 ? "" : r.err;
+        }
+    };
+    const struct {
+        int opcode;
+        const char *type, *left, *right, *error;
+    } cases[] = {
+        {op::PLUS, "float", "int", "float", ""},
+        {op::PLUS, "complex", "int", "complex", ""},
+        {op::PLUS, "int", "complex", "int", "PLUS of type int"},
+        {op::PLUS, "int", "function", "int", "PLUS of what has type int()"},
+        {op::UMINUS, "float", "complex", "", "UMINUS of type float"},
+        {op::ANDB, "int", "float", "int", "ANDB of what has type float"},
+        {op::EQ, "int", "complex", "complex", ""},
+        {op::EQ, "complex", "int", "int", "EQ of type complex float"},
+        {op::LT, "int", "complex", "int", "LT of what has type complex float"},
+        {op::ASG, "complex", "complex", "int", ""},
+        {op::ASG, "complex", "complex", "pointer", "ASG of what has type int *"},
+        {op::ASG, "int", "", "int", "ASG to what is no place"},
+    };
+    for (const auto& c : cases) {
+        UNIT unit;
+        const std::string error = unit.error(c.opcode, c.type, c.left, c.right);
+        EXPECT_EQ(error.empty(), !*c.error) << error;
+        EXPECT_NE(error.find(c.error), std::string::npos) << error << " instead of " << c.error;
+    }
+}
+
 TEST_F(ReadTest, WhatAnEarlierRunLearnedOfAnAccessIsDropped) {
     begin_main();
     IC_NODE* access = node(119, pkg.int_t, name(x));

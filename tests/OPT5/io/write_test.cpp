@@ -67,6 +67,15 @@ TEST_F(WriteTest, WideConstantsAreLconsOnlyWhereTheyMustBe) {
     expect_lines({"_wide = 4294967296", "_small = -2147483648"});
 }
 
+TEST_F(WriteTest, APointersConstantIsItsBits) {
+    TYPE* const type = pkg.mk_ptr(int_fn);
+    begin_main();
+    statement(node(op::UCALL, pkg.int_t, icon(0xFFFFFFFF, type)));
+    ret(icon(0));
+    end();
+    expect_lines({"4294967295()"});
+}
+
 TEST_F(WriteTest, ParametersKeepTheirOrderAndUnusedLocalsGo) {
     IC_SYMBOL* f = global("_f", function_type({pkg.int_t, pkg.long_t, pkg.int_t}, pkg.int_t));
     begin(f);

@@ -175,6 +175,28 @@ TEST_F(ExecTest, FalseAssertionIsReportedOnRequest) {
     expect_error(EXEC_CHECK, "asserted", options);
 }
 
+// Files that no parser writes: an operation on types that it has no form for, an operand of no type.
+TEST_F(ExecTest, WhatHasNoFormIsRefused) {
+    begin(main_sym);
+    body();
+    statement(node(ENDLOOP, pkg.int_t, name(main_sym), label(1)));
+    file->if_write_label(1);
+    end();
+    expect_error(EXEC_UNSUPPORTED, "operands of such types");
+}
+
+TEST_F(ExecTest, WhatHasNoTypeIsRefused) {
+    TYPE* pair = structure("pair", 32, {{"a", pkg.int_t, 0, 0}});
+    IC_SYMBOL* s = global("_s", pair);
+    begin(main_sym);
+    body();
+    IC_NODE* const untyped = name(s);
+    untyped->type = nullptr;
+    statement(node(EQ, pkg.int_t, untyped, name(s)));
+    end();
+    expect_error(EXEC_UNSUPPORTED, "cannot execute EQ");
+}
+
 TEST_F(ExecTest, MultiplyAccumulateAddsTheProductOfTheLastTime) {
     begin(main_sym);
     IC_SYMBOL *acc = local("acc", pkg.long_t), *product = local("product", pkg.long_t);

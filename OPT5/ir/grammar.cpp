@@ -245,7 +245,7 @@ bool is_place(const NODE* t) {
     case DDNODE: return is_place(t->left);
     case COMMAOP:
     case PCOMMA: return is_place(t->right);
-    default: return false;
+    default: return in_graph && t->op > VREG; // the optimizer's own forms
     }
 }
 

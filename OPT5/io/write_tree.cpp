@@ -88,6 +88,9 @@ NODE* prepare_node(NODE* t) {
         if (t->u.sym->level == 0) t->u.sym->cqual |= CQ_REFERENCED;
         return t;
     case ICON:
+        // A pointer's constant may be held with a sign; in the file it is the pattern of its bits.
+        if (t->type->is_pointer() && t->u.lval.fits<int32_t>())
+            t->u.lval = INT65(static_cast<uint32_t>(t->u.lval.fits_in<int32_t>()));
         if (t->type->size > 32 && !fits_32_bits(t)) t->op = LCON;
         return t;
     case UAND:

@@ -82,10 +82,7 @@ I_SYMTAB* NODE::name_symbol() const { return u.sym; }
 int NODE::field_kind() const { return 1; }
 fkMDATA* NODE::field_mval() const { return mval; }
 TYPE* NODE::field_csu() const { return u.csu; }
-// A pointer's constant may be held with a sign; in the file it is the pattern of its bits.
-uint32_t NODE::icon_uvalue() const {
-    return u.lval.is_negative() ? static_cast<uint32_t>(u.lval.fits_in<int32_t>()) : u.lval.fits_in<uint32_t>();
-}
+uint32_t NODE::icon_uvalue() const { return u.lval.fits_in<uint32_t>(); }
 int32_t NODE::icon_svalue() const { return u.lval.fits_in<int32_t>(); }
 const char* NODE::lcon_value() const { return int2text(u.lval, nullptr, 10, 0); } // without a type: no suffix
 const char* NODE::scon_value() const { return text; }

@@ -204,6 +204,26 @@ private:
         if (!same_payload(t->op, 0)) fill(t);
     }
 
+    // ---- Types, in place: the types made of them keep their sizes, as in a file that somebody put together
+    void change_type() {
+        TYPE* const t = any(types)->real;
+        fkMDATA* m = members.empty() ? nullptr : const_cast<fkMDATA*>(any(members)->real->mdata());
+        for (uint64_t skip = below(6); m && m->next && skip > 0; --skip) m = m->next;
+        switch (below(m ? 7 : 3)) {
+        case 0: t->size = one_in(2) ? below(9) * 16 : static_cast<uint64_t>(any_value()) & UINT32_MAX; return;
+        case 1: t->align = one_in(2) ? 1u << below(8) : any_number(); return;
+        case 2: // another name and layout for what only looks at kinds
+            t->size = any(types)->size;
+            return;
+        case 3: m->offset = static_cast<int32_t>(one_in(2) ? static_cast<int64_t>(below(100)) : any_value()); return;
+        case 4: m->width = any_number(); return;
+        case 5: m->is_bitfld = !m->is_bitfld; return;
+        default:
+            if (TYPE* other = any_type()) m->type = other;
+            return;
+        }
+    }
+
     // ---- Symbols
     void change_symbol() {
         IC_SYMBOL* const s = any(symbols);
@@ -296,9 +316,10 @@ private:
     }
 
     void change() {
-        switch (below(8)) {
+        switch (below(9)) {
         case 0: return change_symbol();
         case 1: return change_records();
+        case 2: return change_type();
         default: return change_tree();
         }
     }

@@ -171,7 +171,7 @@ void run_barrier() {
 }
 
 void prepare_lists(void (*write_function)()) {
-    output_step = new pass("output function", write_function);
+    output_step = new pass(ROW{ROW::FIXED, "output function", nullptr, nullptr, write_function, fact::none, fact::none});
     steps_table.clear();
     for (SYMTAB* sym : functions) {
         steps_table[sym].assign(permuted_order.begin(), permuted_order.end());

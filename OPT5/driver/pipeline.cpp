@@ -38,7 +38,7 @@ void validate_current_function(const ROW& row, const std::string& label) {
 }
 
 void do_work(const ROW& row) {
-    if (row.condition && !row.condition()) return;
+    if (row.kind == ROW::IDLE || (row.condition && !row.condition())) return;
     if (row.frame) row.frame->begin();
     if (row.needs) need(row.needs);
     row.action();

@@ -23,6 +23,9 @@ struct ROW {
         FUNCTION,
         BARRIER, // once for the whole program, with no current function
         FIXED,   // of a function; the program is not one without it, so no switch takes it out
+        // Of a function; its action changes nothing: what it calls is not built yet, or has no work on this target. The row is
+        // entered and dumped, its frame and its action are left out.
+        IDLE,
     };
     KIND kind;
     const char* name;

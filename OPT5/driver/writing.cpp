@@ -24,7 +24,7 @@ namespace {
 // A function that was folded into all its callers leaves no records.
 bool is_written() { return !TEST_FLAG(currfuninfo, FUN_is_suppressed); }
 
-constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED;
+constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED, IDLE = ROW::IDLE;
 constexpr bool (*always)() = nullptr;
 using fact::none;
 
@@ -38,17 +38,17 @@ const ROW rows[] = {
     {F,     "allocate registers",     nullptr, always, allocate_regs, none, none},
     {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, none, none},
     {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, none},
-    {F,     "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, none},
+    {IDLE,  "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, none},
     {F,     "last simpcfg",           nullptr, is_written, [] { simpcfg(1, 0); }, none, none},
     {F,     "rotate loops",           nullptr, is_written, rotate_loops, none, none},
     {F,     "straighten traces",      nullptr, is_written, straighten_traces_in_cfg, none, none},
-    {F,     "last disclose vectors",  nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
+    {IDLE,  "last disclose vectors",  nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
     {F,     "unsimplify",             nullptr, is_written, unsimplify, none, none},
-    {FIXED, "last disguise vectors",  nullptr, is_written, disguise_vector_operations, none, none},
+    {IDLE,  "last disguise vectors",  nullptr, is_written, disguise_vector_operations, none, none},
     {FIXED, "machine state",          nullptr, is_written, strip_implicit_states, none, none},
-    {F,     "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
-    {F,     "vectors for output",     nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
-    {F,     "load speculation",       nullptr, is_written, finalize_ldspec_advice, none, none},
+    {IDLE,  "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
+    {IDLE,  "vectors for output",     nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
+    {IDLE,  "load speculation",       nullptr, is_written, finalize_ldspec_advice, none, none},
     {FIXED, "prune exception table",  nullptr, is_written, prune_exception_table, none, none},
     {F,     "profile",                nullptr, is_written, [] { initialize_CFG_profiling_annotation(true, true); }, none, none},
 };

@@ -7,9 +7,11 @@
 
 #include "OPT5/alias/effects.h"
 #include "OPT5/alias/state.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 
+#include <algorithm>
 #include <vector>
 
 bool file_symbols_are_known = false;
@@ -114,11 +116,7 @@ bool is_vector_or_complex(const TYPE* type) { return type->is_vector() || type->
 
 void mark_addressed_symbols(NODE* tree) { mark_addressed(tree, false); }
 
-namespace {
-const FUNINFO* marked_function = nullptr;
-}
-
-bool marks_are_known() { return marked_function && marked_function == currfuninfo; }
+bool marks_are_known() { return is_known(fact::alias_marks); }
 
 bool may_be_reached_by_pointers(const SYMTAB* sym) {
     if (sym->is_function()) return false;
@@ -147,31 +145,51 @@ void set_marks(POINTER_WRITES* writes) {
             if (writes) writes->collect(t);
         });
     });
-    marked_function = f;
-    forget_groups();
-    f->spmap->clear();
 }
+
+bool groups_can_be_built() { return currfuninfo->ls_root && currfuninfo->bottom_ptr; }
+
+void find_pointers(FACTS wanted, const POINTER_WRITES& writes) {
+    if (wanted & fact::pointer_groups && groups_can_be_built()) build_groups(writes);
+    if (wanted & fact::pointees) find_pointees(writes);
+}
+
+void find_marks(FACTS wanted) {
+    POINTER_WRITES writes;
+    set_marks(wanted == fact::alias_marks ? nullptr : &writes);
+    currfuninfo->facts |= fact::alias_marks;
+    find_pointers(wanted, writes); // by the marks
+}
+
+// A mark too many is no fault; one too few is.
+bool marks_still_hold() {
+    std::vector<SYMTAB*> unmarked;
+    auto note = [&](SYMTAB* s) {
+        if (!s->is_aliased()) unmarked.push_back(s);
+    };
+    for_each_symbol(note);
+    for (SYMTAB* s = global_symbols; s; s = s->next) note(s);
+    set_marks(nullptr);
+    return std::none_of(unmarked.begin(), unmarked.end(), [](const SYMTAB* s) { return s->is_aliased(); });
+}
+
+const FACT_FINDER marks("aliased objects", fact::alias_marks, fact::none, find_marks, nullptr, marks_still_hold,
+                        fact::pointees | fact::pointer_groups);
+const FACT_FINDER pointers("what pointers point into", fact::pointees | fact::pointer_groups, fact::alias_marks,
+                           [](FACTS wanted) { find_pointers(wanted, pointer_writes(currfuninfo)); },
+                           [] { currfuninfo->spmap->clear(); });
 
 } // namespace
 
-void init_alias_marks() { set_marks(nullptr); }
+bool groups_are_known() { return is_known(fact::pointer_groups) && groups_can_be_built(); }
 
 void init_aliasing_info(bool groups) {
-    FUNINFO* f = currfuninfo;
-    POINTER_WRITES writes;
-    set_marks(&writes);
-    // From here on what depends on the marks.
-    if (groups && f->ls_root && f->bottom_ptr) build_groups(writes);
-    find_pointees(writes);
+    changed(fact::every & ~fact::alias);
+    need(groups ? fact::alias : fact::alias_marks | fact::pointees);
 }
 
 void reset_alias_info() {
-    marked_function = nullptr;
-    forget_groups();
-    if (currfuninfo) {
-        unmark_globals();
-        currfuninfo->spmap->clear();
-    }
+    if (currfuninfo) changed(fact::every & ~fact::alias);
     compute_alias_sets({});
 }
 

@@ -3,6 +3,7 @@
 
 #include "OPT5/alias/address_form.h"
 #include "OPT5/alias/state.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -14,7 +15,7 @@
 LOOP_ASSERTION_HOOKS loop_assertion_hooks;
 bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b) = nullptr;
 
-void init_dd_aliasing() { init_aliasing_info(true); }
+void init_dd_aliasing() { need(fact::alias); }
 void propagate_PT_info() {}
 
 namespace {

@@ -3,7 +3,7 @@
 //
 // Every question here is a "may": where it cannot be decided the answer is true. Lvalues are NAME, UMULT, STREF and
 // STDOT trees, also under DDNODE, SSA operators and the transparent wrappers; they are borrowed and left alone.
-// `lvalues_may_be_aliased` and what is built on it rely on the marks that `init_aliasing_info` sets.
+// `lvalues_may_be_aliased` and what is built on it rely on `fact::alias_marks`.
 #pragma once
 
 #include "IFILE/base_node.h"
@@ -19,11 +19,11 @@ struct LS;
 struct fkMDATA;
 
 // ---- Life
-// Sets `is_aliased` of every symbol of the current function and of the globals: true for an object that something other
-// than its own NAME may reach. `groups`: the equivalence groups of pointers are built as well, if the scopes are known.
+// A pass asks for what it relies on with `need`: `fact::alias_marks` sets `is_aliased` of every symbol of the current
+// function and of the globals, true for an object that something other than its own NAME may reach; `fact::pointees` fills
+// the SPMAP; `fact::pointer_groups` builds the equivalence groups of pointers, if the scopes are known.
+// Finds the three anew, the groups only with `groups`.
 void init_aliasing_info(bool groups);
-// The marks alone, for a pass that asks for no more than `is_aliased`: of pointers nothing is known afterwards.
-void init_alias_marks();
 // Marks the vector and complex variables that are accessed by parts or as another type. `clear_bitnum` also takes them
 // out of the candidates that are numbered by `bitnum`; `aliased` is the mark that they get.
 void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased);

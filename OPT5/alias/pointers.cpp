@@ -173,7 +173,6 @@ void find_roots(FUNINFO* f, const std::vector<DEFINITION>& definitions) {
         if (!p->root) p->root = bottom;
 }
 
-const FUNINFO* grouped_function = nullptr;
 
 void print_group(const PTR* p) {
     debug_printf("\nPTR #%u in scope ", p->number);
@@ -199,14 +198,10 @@ void print_group(const PTR* p) {
 
 } // namespace
 
-bool groups_are_known() { return grouped_function && grouped_function == currfuninfo; }
-void forget_groups() { grouped_function = nullptr; }
-
 void LS::build_PTR_equivalence_groups() { build_groups(pointer_writes(currfuninfo)); }
 
 void build_groups(const POINTER_WRITES& writes) {
     FUNINFO* f = currfuninfo;
-    grouped_function = f;
     OPT_ASSERT(f->bottom_ptr && f->ls_root);
     for (PTR* p = f->ptrs; p; p = p->next) p->flags &= ~PTR_IS_REASSIGNED;
     f->bottom_ptr->scope = f->ls_root;

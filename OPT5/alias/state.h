@@ -8,10 +8,9 @@ class FUNINFO;
 class NODE;
 class SYMTAB;
 
-bool marks_are_known();                             // `init_aliasing_info` ran for the current function
+bool marks_are_known();                             // of the current function
 bool may_be_reached_by_pointers(const SYMTAB* sym); // true as well while the marks are not known
 bool groups_are_known();                            // the groups of pointers, for the current function
-void forget_groups();
 
 // How the pointer variables of a function get their values.
 struct POINTER_WRITES {

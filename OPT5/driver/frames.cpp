@@ -5,6 +5,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symtab.h"
@@ -41,7 +42,7 @@ void begin(bool force) {
 void end() {
     denormalize_statements();
     widen_user_variables();
-    lva_cleanup();
+    changed(fact::graph);
 }
 
 } // namespace

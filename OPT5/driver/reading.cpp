@@ -33,24 +33,26 @@ void size_site_sets() {
 
 constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED, IDLE = ROW::IDLE;
 constexpr bool (*always)() = nullptr;
+using fact::alias_marks;
+using fact::graph;
 using fact::none;
 
 // clang-format off
 const ROW rows[] = {
     // kind, name, frame, condition, action, needs, leaves
-    {F,     "find synonyms",               nullptr, always, check_for_synonym_function_in_pass_1, none, none},
+    {F,     "find synonyms",               nullptr, always, check_for_synonym_function_in_pass_1, none, graph},
     {IDLE,  "find integrable functions",   nullptr, always, check_integrable_definition, none, none},
     {FIXED, "sequence",                    nullptr, always, [] { seq_trees(L2() ? propagate_global_constants : nullptr); }, none, none},
     {FIXED, "build graph",                 nullptr, always, buildcfg, none, fact::block_numbers},
-    {F,     "tail recursion",              nullptr, always, remove_tail_recursion, none, none},
-    {F,     "first simpcfg",               nullptr, always, [] { simpcfg(0, 0); }, none, none},
-    {F,     "first fast_CP",               nullptr, always, [] { fast_CP(4, 1); }, none, none},
-    {FIXED, "scan definition",             nullptr, always, [] { preprocess_fundef(currfuninfo); }, none, none},
+    {F,     "tail recursion",              nullptr, always, remove_tail_recursion, none, graph},
+    {F,     "first simpcfg",               nullptr, always, [] { simpcfg(0, 0); }, none, graph},
+    {F,     "first fast_CP",               nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
+    {FIXED, "scan definition",             nullptr, always, [] { preprocess_fundef(currfuninfo); }, none, graph},
     {FIXED, "call sites",                  nullptr, always, size_site_sets, none, fact::every},
     {IDLE,  "parameters",                  nullptr, always, init_ipcp_for_fun, none, none},
     {IDLE,  "parameters by metavalues",    nullptr, [] { return do_IP_MVP; }, init_IP_MVP_for_current_function, none, none},
-    {F,     "find local statics",          nullptr, always, identify_fl_statics_safe_for_auto, none, none},
-    {F,     "convert local statics",       nullptr, always, [] { convert_safe_fl_statics_to_auto(currfuninfo); }, none, none},
+    {F,     "find local statics",          nullptr, always, identify_fl_statics_safe_for_auto, none, graph},
+    {F,     "convert local statics",       nullptr, always, [] { convert_safe_fl_statics_to_auto(currfuninfo); }, none, graph},
 };
 // clang-format on
 

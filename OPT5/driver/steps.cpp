@@ -219,14 +219,18 @@ void DIVs_by_ICONs() {
 void nothing() {}
 
 constexpr ROW::KIND F = ROW::FUNCTION, B = ROW::BARRIER, L = ROW::IDLE;
-using fact::every;
+using fact::alias;
+using fact::alias_marks;
+using fact::dominators;
+using fact::graph;
+using fact::live_variables;
 using fact::none;
 
 // clang-format off
 const ROW steps[] = {
     // kind, name, frame, condition, action, needs, leaves
-    /*  0 */ {F, "pass 1 fcp/eda", nullptr, L2, [] { fast_CP(4, 0); elim_dead_assigns(0, 0); }, none, none},
-    /*  1 */ {F, "pass 1 fast_CP(4,0)", nullptr, always, [] { fast_CP(4, 0); }, none, none},
+    /*  0 */ {F, "pass 1 fcp/eda", nullptr, L2, [] { fast_CP(4, 0); elim_dead_assigns(0, 0); }, alias_marks, graph},
+    /*  1 */ {F, "pass 1 fast_CP(4,0)", nullptr, L1, [] { fast_CP(4, 0); }, alias_marks, graph},
     /*  2 */ {L, "value propagation for pass 1", nullptr, L2, [] { init_dd_aliasing(); do_value_propagation(); }, none, none},
     /*  3 */ {B, "analyze globals", nullptr, always, analyze_global_symbols, none, none},
     /*  4 */ {B, "detect_recursion", nullptr, always, detect_recursion, none, none},
@@ -236,22 +240,22 @@ const ROW steps[] = {
     /*  8 */ {B, "collect_clustered_symbols", nullptr, always, collect_clustered_symbols, none, none},
     /*  9 */ {B, "pass 2 header", nullptr, always, pass_2_header, none, none},
     /* 10 */ {B, "set call-graph order", nullptr, always, set_call_graph_order, none, none},
-    /* 11 */ {F, "pass 2 inits", nullptr, always, pass_2_inits, none, none},
-    /* 12 */ {F, "stack sharing", nullptr, is_stack_shared, stack_sharing, none, none},
-    /* 13 */ {F, "CPS", nullptr, always, straighten_cond_paths, none, none},
+    /* 11 */ {F, "pass 2 inits", nullptr, always, pass_2_inits, none, graph},
+    /* 12 */ {F, "stack sharing", nullptr, is_stack_shared, stack_sharing, none, graph},
+    /* 13 */ {F, "CPS", nullptr, always, straighten_cond_paths, none, graph},
     /* 14 */ {L, "early LIR", nullptr, always, early_LIR, none, none},
-    /* 15 */ {F, "early fast_CP(4,1)", nullptr, always, [] { fast_CP(4, 1); }, none, none},
+    /* 15 */ {F, "early fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
     /* 16 */ {L, "MVP global assertions", nullptr, [] { return do_IP_MVP; }, add_MVP_IP_global_assertions, none, none},
     /* 17 */ {L, "intraprocedural MVP", nullptr, L2, intraprocedural_MVP, none, none},
     /* 18 */ {L, "value propagation for SIMD", nullptr, L2_and_SIMD, value_propagation_for_SIMD, none, none},
-    /* 19 */ {F, "explode auto structs", nullptr, L2, explode_auto_struct_vars, none, none},
+    /* 19 */ {F, "explode auto structs", nullptr, L2, explode_auto_struct_vars, none, graph},
     /* 20 */ {L, "non-DD clone SSA NASSERTs", nullptr, L2, [] { in_SSA_form<true>(clone_SSA_NASSERTs); }, none, none},
     /* 21 */ {L, "non-DD SSA CP", nullptr, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(1); }); }, none, none},
     /* 22 */ {L, "non-DD SSA EDA", nullptr, L2, [] { in_SSA_form<true>(eliminate_dead_SSA_assignments); }, none, none},
     /* 23 */ {L, "SSA RP with benign loads", nullptr, L2, [] { promote_vars_to_registers(true); }, none, none},
-    /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, none},
-    /* 25 */ {F, "fast_CP(0,1)", nullptr, always, [] { fast_CP(0, 1); }, none, none},
-    /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, none},
+    /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
+    /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
+    /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
     /* 28 */ {L, "forward_substitution", &DF, L2, nothing, none, none},
     /* 29 */ {L, "SSA_hoist", &D, L2, [] { in_SSA_form<true>(hoist_SSA_region_constants); }, none, none},
@@ -282,26 +286,26 @@ const ROW steps[] = {
     /* 54 */ {L, "alias_advice", &D_with_dependence, L2, [] { report_ambiguous_aliases(root()); }, none, none},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {L, "value_propagation", &D, L2, value_propagation, none, none},
-    /* 57 */ {F, "DIVs_by_ICONs", nullptr, always, DIVs_by_ICONs, none, none},
+    /* 57 */ {F, "DIVs_by_ICONs", nullptr, always, DIVs_by_ICONs, none, graph},
     /* 58 */ {L, "SSA_propagate_vector", &D, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(3); }); }, none, none},
     /* 59 */ {L, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, none},
-    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", nullptr, L2, promote_and_clean_up, none, none},
+    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", nullptr, L2, promote_and_clean_up, none, graph},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
-    /* 62 */ {F, "late fast_CP(4,1)", nullptr, always, [] { fast_CP(4, 1); }, none, none},
+    /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},
     /* 64 */ {L, "global CP", nullptr, L2_with_branches, [] { unbuild_loop_hierarchy(); copyprop(1); }, none, none},
     /* 65 */ {L, "late points-to", nullptr, L2_with_branches, propagate_PT_info, none, none},
     /* 66 */ {L, "global CSE", nullptr, L2_with_branches, global_CSE, none, none},
     /* 67 */ {L, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, none, none},
-    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, rename_symbols, none, none},
-    /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, none, none},
+    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, rename_symbols, dominators | live_variables, graph},
+    /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, live_variables, graph},
     /* 70 */ {L, "DD restructuring", nullptr, always, nothing, none, none},
     /* 71 */ {L, "expand cluster refs", nullptr, always, expand_cluster_refs, none, none},
-    /* 72 */ {F, "CSU returning temp", nullptr, always, subst_csu_returning_temp_for_local_var, none, none},
-    /* 73 */ {F, "superblocks", nullptr, L1, optimize_superblocks_in_cfg, none, none},
-    /* 74 */ {F, "subrange", nullptr, L1, [] { reset_alias_info(); lcse_subrange_assignments(); elim_dead_subrange_assigns(); }, none, none},
+    /* 72 */ {F, "CSU returning temp", nullptr, always, subst_csu_returning_temp_for_local_var, none, graph},
+    /* 73 */ {F, "superblocks", nullptr, L1, optimize_superblocks_in_cfg, alias_marks, graph},
+    /* 74 */ {F, "subrange", nullptr, L1, [] { lcse_subrange_assignments(); elim_dead_subrange_assigns(); }, alias, graph},
     /* 75 */ {L, "lcp", nullptr, L1, [] { copyprop(1); }, none, none},
-    /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, none},
+    /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, graph},
     /* 77 */ {L, "lcse", nullptr, L1, lcse, none, none},
     /* 78 */ {L, "propagate increments", nullptr, L1, propagate_increments, none, none},
     /* 79 */ {L, "Disguise Vectors", nullptr, always, disguise_vector_operations, none, none},

@@ -26,31 +26,33 @@ bool is_written() { return !TEST_FLAG(currfuninfo, FUN_is_suppressed); }
 
 constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED, IDLE = ROW::IDLE;
 constexpr bool (*always)() = nullptr;
+using fact::graph;
+using fact::live_variables;
 using fact::none;
 
 // clang-format off
 const ROW rows[] = {
     // kind, name, frame, condition, action, needs, leaves
-    {FIXED, "drop unused locals",     nullptr, always, drop_unused_locals, none, none},
-    {F,     "combine assignments",    nullptr, always, combine_asgs_to_memory, none, none},
-    {F,     "switch cases",           nullptr, always, optimize_SWITCH_cases, none, none},
-    {FIXED, "register definitions",   nullptr, always, [] { init_reg_defs(); }, none, none},
-    {F,     "allocate registers",     nullptr, always, allocate_regs, none, none},
-    {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, none, none},
-    {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, none},
+    {FIXED, "drop unused locals",     nullptr, always, drop_unused_locals, none, graph},
+    {F,     "combine assignments",    nullptr, always, combine_asgs_to_memory, none, graph},
+    {F,     "switch cases",           nullptr, always, optimize_SWITCH_cases, none, graph},
+    {FIXED, "register definitions",   nullptr, always, [] { init_reg_defs(); }, none, graph},
+    {F,     "allocate registers",     nullptr, always, allocate_regs, none, graph},
+    {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, live_variables, graph},
+    {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, graph},
     {IDLE,  "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, none},
-    {F,     "last simpcfg",           nullptr, is_written, [] { simpcfg(1, 0); }, none, none},
-    {F,     "rotate loops",           nullptr, is_written, rotate_loops, none, none},
-    {F,     "straighten traces",      nullptr, is_written, straighten_traces_in_cfg, none, none},
+    {F,     "last simpcfg",           nullptr, is_written, [] { simpcfg(1, 0); }, none, graph},
+    {F,     "rotate loops",           nullptr, is_written, rotate_loops, none, graph},
+    {F,     "straighten traces",      nullptr, is_written, straighten_traces_in_cfg, none, graph},
     {IDLE,  "last disclose vectors",  nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
-    {F,     "unsimplify",             nullptr, is_written, unsimplify, none, none},
+    {F,     "unsimplify",             nullptr, is_written, unsimplify, none, graph},
     {IDLE,  "last disguise vectors",  nullptr, is_written, disguise_vector_operations, none, none},
-    {FIXED, "machine state",          nullptr, is_written, strip_implicit_states, none, none},
+    {FIXED, "machine state",          nullptr, is_written, strip_implicit_states, none, graph},
     {IDLE,  "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
     {IDLE,  "vectors for output",     nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
     {IDLE,  "load speculation",       nullptr, is_written, finalize_ldspec_advice, none, none},
-    {FIXED, "prune exception table",  nullptr, is_written, prune_exception_table, none, none},
-    {F,     "profile",                nullptr, is_written, [] { initialize_CFG_profiling_annotation(true, true); }, none, none},
+    {FIXED, "prune exception table",  nullptr, is_written, prune_exception_table, none, graph},
+    {F,     "profile",                nullptr, is_written, [] { initialize_CFG_profiling_annotation(true, true); }, none, graph},
 };
 // clang-format on
 

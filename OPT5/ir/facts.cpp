@@ -29,26 +29,28 @@ FACTS with_what_rests_on(FACTS gone) {
 
 } // namespace
 
-FACT_FINDER::FACT_FINDER(const char* name, FACTS finds, FACTS rests_on, void (*find)(FACTS), void (*forget)(),
-                         bool (*still_holds)())
-    : name(name), finds(finds), rests_on(rests_on), find(find), forget(forget), still_holds(still_holds) {
-    for_each_fact(finds, [this](FACTS one, const FACT_FINDER*) {
-        for (int i = 0; i < fact::count; ++i)
-            if (one == FACTS(1) << i) finders[i] = this;
-    });
+FACT_FINDER::FACT_FINDER(const char* name, FACTS fact, FACTS rests_on, void (*find)(FACTS), void (*forget)(),
+                         bool (*still_holds)(), FACTS on_the_way)
+    : name(name), rests_on(rests_on), on_the_way(on_the_way), find(find), forget(forget), still_holds(still_holds) {
+    for (int i = 0; i < fact::count; ++i)
+        if (fact >> i & 1) finders[i] = this;
 }
 
+// A fact rests on facts of lower bits alone, so that one walk over the bits takes each behind what it rests on.
 void need(FACTS wanted) {
     FUNINFO* f = currfuninfo;
-    for (FACTS missing; (missing = wanted & ~f->facts) != 0;) {
-        const FACT_FINDER* finder = nullptr;
-        for_each_fact(missing, [&](FACTS, const FACT_FINDER* candidate) {
-            if (!finder) finder = candidate;
-        });
-        OPT_ASSERT(finder != nullptr);
-        need(finder->rests_on);
-        finder->find(finder->finds & missing);
-        f->facts |= finder->finds & missing;
+    if (!(wanted & ~f->facts)) return;
+    for (int i = fact::count - 1; i >= 0; --i)
+        if (wanted >> i & 1) {
+            OPT_ASSERT(finders[i] != nullptr);
+            wanted |= finders[i]->rests_on;
+        }
+    for (int i = 0; i < fact::count; ++i) {
+        const FACTS one = FACTS(1) << i;
+        if (!(wanted & ~f->facts & one)) continue;
+        const FACTS found = one | (finders[i]->on_the_way & wanted & ~f->facts);
+        finders[i]->find(found);
+        f->facts |= found;
     }
 }
 

@@ -31,16 +31,16 @@ constexpr int count = 7;
 
 struct FACT_FINDER {
     const char* name;
-    FACTS finds;             // one fact, or several that one walk finds
-    FACTS rests_on;          // needed first; where one of these is forgotten, so is what rests on it
-    void (*find)(FACTS);     // those of `finds` that are wanted, for the current function
+    FACTS rests_on;      // needed first; where one of these is forgotten, so is what rests on it
+    FACTS on_the_way;    // what the same walk finds beside it where that is wanted too
+    void (*find)(FACTS); // the fact and what of `on_the_way` is given, for the current function
     void (*forget)();        // gives back what the fact holds in memory; may be null
     // For validation: finds it anew and compares; on return the fact is as it was or found anew. True if what was known
     // is still so. May be null.
     bool (*still_holds)();
 
-    FACT_FINDER(const char* name, FACTS finds, FACTS rests_on, void (*find)(FACTS), void (*forget)() = nullptr,
-                bool (*still_holds)() = nullptr);
+    FACT_FINDER(const char* name, FACTS fact, FACTS rests_on, void (*find)(FACTS), void (*forget)() = nullptr,
+                bool (*still_holds)() = nullptr, FACTS on_the_way = fact::none);
     FACT_FINDER(const FACT_FINDER&) = delete;
     FACT_FINDER& operator=(const FACT_FINDER&) = delete;
 };

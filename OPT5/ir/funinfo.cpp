@@ -323,6 +323,7 @@ bool sym_appears_in_EHT(const SYMTAB* sym) {
 }
 
 bool only_its_name_reaches(const SYMTAB* sym) {
+    if (!is_known(fact::alias_marks)) return false;
     if (!sym->is_automatic() && !(sym->level > 0 && sym->sclass == SC_PARM)) return false;
     return !sym->is_aliased() && !sym->type->is_volatile() && !sym_appears_in_EHT(sym);
 }

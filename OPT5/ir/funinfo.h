@@ -213,6 +213,7 @@ void dump_function_header(bool to_info = false); // of the current function, to 
 void erase_all();                           // drops the current function's body
 bool sym_appears_in_EHT(const SYMTAB* sym); // of the current function
 // Whether nothing but its NAME in the statements of the current function reads or writes the object: a parameter or an
-// automatic variable that is not volatile, not aliased as the marks stand, and in no exception's clean-up.
+// automatic variable that is not volatile, not aliased, and in no exception's clean-up. False while `fact::alias_marks` is not
+// known.
 bool only_its_name_reaches(const SYMTAB* sym);
 bool is_private_name(const NODE* t); // a NAME of a scalar of that kind

@@ -8,6 +8,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -162,12 +163,11 @@ void print_outcome(const NODE* first, const NODE* second, const OUTCOME& out) {
 }
 
 // True if the pair at `s` became one, or one and a temporary.
-bool combine_at(LIST* s, bool* marked) {
+bool combine_at(LIST* s) {
     LIST* next = s->rest;
     if (!next || !is_candidate(s->first) || !is_candidate(next->first)) return false;
     if (!trees_are_congruent(s->first->left, next->first->left, false)) return false;
-    if (!*marked) init_aliasing_info(true);
-    *marked = true;
+    need(fact::alias);
     const OUTCOME out = combine(s->first, next->first);
     if (!out.store) return false;
     print_outcome(s->first, next->first, out);
@@ -183,17 +183,21 @@ bool combine_at(LIST* s, bool* marked) {
 void combine_asgs_to_memory() {
     if (opt_level() == 0) return;
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'combine_asgs_to_memory' -------\n");
-    bool marked = false;
+    bool combined = false;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LIST** link = &bb->statements; *link;) {
             LIST* s = *link;
-            if (!combine_at(s, &marked)) {
+            if (!combine_at(s)) {
                 link = &s->rest;
-            } else if (s->first) {
+                continue;
+            }
+            combined = true;
+            if (s->first) {
                 link = &s->rest; // the temporary's definition stands in front of the store
             } else {
                 *link = s->rest;
                 delete s;
             }
         }
+    if (combined) changed(fact::graph);
 }

@@ -11,6 +11,7 @@
 // them and the accesses of the local; and no copy is followed by anything that could still change the local.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -163,7 +164,7 @@ void hand_results_over() {
         for (LIST* s = bb->statements; s; s = s->rest)
             if (passes_result_on(s)) calls.push_back(s);
     if (calls.empty()) return;
-    init_alias_marks();
+    need(fact::alias_marks);
     std::unordered_map<const SYMTAB*, int> names;
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (const LIST* s = bb->statements; s; s = s->rest) {

@@ -12,6 +12,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -266,8 +267,9 @@ int elim_dead_assigns(bool keep_embedded, bool early) {
     if (!f || !f->bb_list) return 0;
     sym_split(f);
     if (TEST_FLAG(f, FUN_is_cpp)) remove_unneeded_stores_from_destructor();
-    find_live_variables(1, true);
+    need(fact::live_variables);
     if (f->lva_sym_count == 0) return 0;
+    count_lifetimes();
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'elim_dead_assigns' ----------\n");
     ELIMINATION elimination;
     BBLK* const entry = f->bb_list;
@@ -279,7 +281,7 @@ int elim_dead_assigns(bool keep_embedded, bool early) {
         graph_changed = delay_assignments();
         if (graph_changed) promote_all_embedded_assignments();
     }
-    lva_cleanup();
+    changed(fact::none);
     if (!early && !f->bb_list->loop && (graph_changed || (elimination.count && some_block_only_jumps()))) simpcfg(false, false);
     return elimination.count;
 }

@@ -8,6 +8,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -71,7 +72,7 @@ void remove_unneeded_stores_from_destructor() {
     if (!fun_is_cpp_destructor(f) || !has_this()) return;
     if (print_debug)
         debug_printf("\n\n\t\t\t---------- ENTERING 'remove_unneeded_stores_from_destructor' ----------\n");
-    init_aliasing_info(false);
+    need(fact::alias_marks | fact::pointees);
     int left = MAX_STORES;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
         for (LIST** link = &bb->statements; *link;) {

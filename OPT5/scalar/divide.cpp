@@ -17,6 +17,7 @@
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -335,7 +336,7 @@ void transform_DIVs_by_ICONs() {
         for (LIST* s = bb->statements; s; s = s->rest)
             if (contains_division(s->first)) divisions.push_back(s);
     if (divisions.empty()) return;
-    init_alias_marks();
+    need(fact::alias_marks);
     const KNOWN_SIGNS known;
     signs = &known;
     bool any = false;

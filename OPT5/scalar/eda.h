@@ -8,8 +8,7 @@ class SYMTAB;
 struct LIST;
 
 // ---- Live variables
-// What each set of a block is. They exist between `find_live_variables` and `lva_cleanup`, with
-// `FUNINFO::lva_sym_count` bits.
+// What each set of a block is. They exist while `fact::live_variables` is known, with `FUNINFO::lva_sym_count` bits.
 enum LIVE_SET { LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF };
 constexpr int NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
 
@@ -18,6 +17,8 @@ constexpr int NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
 // stream.
 void find_live_variables(int mode, bool with_lifetimes);
 void lva_cleanup();
+// The blocks that each candidate is live in, in `depnum`, by the sets as they are.
+void count_lifetimes();
 // The bit of a symbol that is a candidate, or -1.
 int live_index(const SYMTAB* sym);
 

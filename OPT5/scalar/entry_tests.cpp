@@ -11,6 +11,7 @@
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -91,8 +92,7 @@ private:
     // A variable is given what is computed of constants and variables that only their NAMEs reach.
     bool gives_value(const NODE* t) {
         if (t->op != ASG || tree_is_arg_prolog(t)) return false;
-        if (!has_marks) init_alias_marks();
-        has_marks = true;
+        need(fact::alias_marks);
         return is_private_name(t->left) && count_nodes_in_tree(t->right) <= MAX_VALUE_NODES &&
                is_known_computation(t->right);
     }
@@ -131,8 +131,6 @@ private:
         disconnect(before, bb);
         connect(before, target);
     }
-
-    bool has_marks = false;
 };
 
 } // namespace

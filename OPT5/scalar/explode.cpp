@@ -7,6 +7,7 @@
 // stays where it is while that happens. A structure that only passes through whole stays, for one copy is cheaper.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -116,7 +117,7 @@ public:
     void run() {
         list_candidates();
         if (candidates.empty()) return;
-        init_aliasing_info(false);
+        need(fact::alias_marks | fact::pointees);
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
             for (LIST* s = bb->statements; s; s = s->rest) scan_statement(s->first);
         if (!make_variables()) return;

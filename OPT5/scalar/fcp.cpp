@@ -16,6 +16,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -393,9 +394,10 @@ void fast_CP(int iterations, int combine) {
     if (combine) combine_asgs_to_memory();
     for (int left = iterations; left > 0; --left) {
         sym_split(currfuninfo);
-        init_alias_marks();
+        need(fact::alias_marks);
         SWEEP sweep;
         if (!sweep.run()) return;
+        changed(fact::graph);
         if (!sweep.decided_a_branch) continue;
         rebuildcfg();
         simpcfg(0, 0);

@@ -7,6 +7,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -147,8 +148,8 @@ private:
 
 void lcse_subrange_assignments() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
-    init_aliasing_info(true);
+    need(fact::alias);
     KNOWN_VALUES values;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) values.block(bb);
-    reset_alias_info();
+    changed(fact::graph);
 }

@@ -125,7 +125,9 @@ void solve() {
     }
 }
 
-void note_lifetimes() {
+} // namespace
+
+void count_lifetimes() {
     FUNINFO* f = currfuninfo;
     std::vector<int64_t> blocks(static_cast<size_t>(f->lva_sym_count), 0);
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
@@ -138,8 +140,6 @@ void note_lifetimes() {
             if (int n = live_index(sym); n >= 0) sym->set_depnum(blocks[static_cast<size_t>(n)]);
 }
 
-} // namespace
-
 void find_live_variables(int mode, bool with_lifetimes) {
     (void)mode;
     FUNINFO* f = currfuninfo;
@@ -147,12 +147,12 @@ void find_live_variables(int mode, bool with_lifetimes) {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'find_live_variables' --------\n");
     sym_split(f);
     split_statements();
-    init_alias_marks();
+    need(fact::alias_marks);
     number_candidates();
     if (f->lva_sym_count == 0) return;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) compute_use_and_def(bb, static_cast<uint32_t>(f->lva_sym_count));
     solve();
-    if (with_lifetimes) note_lifetimes();
+    if (with_lifetimes) count_lifetimes();
 }
 
 void lva_cleanup() {
@@ -170,6 +170,6 @@ void lva_cleanup() {
 }
 
 namespace {
-const FACT_FINDER live_variables("live variables", fact::live_variables, fact::none,
+const FACT_FINDER live_variables("live variables", fact::live_variables, fact::alias_marks,
                                  [](FACTS) { find_live_variables(0, false); }, lva_cleanup);
 } // namespace

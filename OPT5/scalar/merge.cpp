@@ -15,6 +15,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -569,10 +570,10 @@ void merge_symbols() {
     if (function_saves_environment()) return;
     renumber_bblocks();
     NATURAL_LOOPS loops;
-    find_live_variables(0, false);
+    need(fact::live_variables);
     if (currfuninfo->lva_sym_count) eliminate_single_use_temps();
     for (const auto& loop : loops.inner_first())
         if (loop->inside < DEEPEST) MERGE(loops, loop.get()).run();
-    lva_cleanup();
+    changed(fact::none);
     if (loops.has_split_edges()) renumber_bblocks();
 }

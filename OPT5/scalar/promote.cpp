@@ -9,6 +9,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -303,8 +304,10 @@ void promote_all_embedded_assignments() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         if (block_has_embedded(bb)) blocks.push_back(bb);
     if (blocks.empty()) return;
-    init_aliasing_info(true);
-    bool changed = false;
-    for (BBLK* bb : blocks) changed |= promote_embedded_assignments_in_bb(bb);
-    if (changed) sym_split(currfuninfo);
+    need(fact::alias);
+    bool made_any = false;
+    for (BBLK* bb : blocks) made_any |= promote_embedded_assignments_in_bb(bb);
+    if (!made_any) return;
+    sym_split(currfuninfo);
+    changed(fact::graph);
 }

@@ -4,6 +4,7 @@
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/natural_loops.h"
@@ -59,12 +60,11 @@ void count_loops_around_blocks() {
 }
 
 void prepare_allocation() {
-    find_live_variables(0, false);
-    reset_alias_info();
+    need(fact::live_variables);
     count_loops_around_blocks();
     BBLK* const entry = currfuninfo->bb_list;
     for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) prop_asg_into_if(bb);
-    lva_cleanup();
+    changed(fact::graph);
 }
 
 } // namespace

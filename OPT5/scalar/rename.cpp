@@ -12,6 +12,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -261,8 +262,7 @@ private:
 
 void rename_symbols() {
     if (!currfuninfo->bb_list || currfuninfo->bb_list->predecessors || function_saves_environment()) return;
-    compute_dominators(false);
-    find_live_variables(0, false);
+    need(fact::dominators | fact::live_variables);
     if (currfuninfo->lva_sym_count) RENAMER().run();
-    lva_cleanup();
+    ::changed(fact::graph);
 }

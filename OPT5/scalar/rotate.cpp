@@ -3,6 +3,7 @@
 #include "OPT5/scalar/simpcfg.h"
 
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 
@@ -58,6 +59,7 @@ public:
             currfuninfo->bb_list->rdflink = C;
         int n = first;
         for (BBLK* bb = D; bb != F; bb = bb->dflink) bb->dfn = n++;
+        graph_was_changed(currfuninfo);
         if (print_debug) {
             debug_printf("\n\tAfter loop rotation:\n\n");
             if (fdebug) prbbinfix(fdebug);

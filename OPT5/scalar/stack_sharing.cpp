@@ -13,6 +13,7 @@
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -419,7 +420,7 @@ void check_root() {
 
 void SHARING::run() {
     constexpr uint64_t MOST_BITS = uint64_t(1) << 30; // an offset is a word
-    init_alias_marks();
+    need(fact::alias_marks);
     if (!list_eligible() || !keep_what_is_named_in_scope()) return;
     init_stack_sharing();
     record_scope(LS::level_2_scope());
@@ -448,7 +449,7 @@ void build_stack_sharing_type() {
         if (print_debug && fdebug) currfuninfo->ls_root->print(fdebug);
         SHARING().run();
         init_stack_sharing();
-        reset_alias_info();
+        changed(fact::graph);
     }
     currfuninfo->stack_is_laid_out = true;
 }

@@ -8,6 +8,7 @@
 #include "OPT5/alias/address_form.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -91,7 +92,7 @@ bool starts_as_zero(const SYMTAB* s) {
 class CONVERSION {
 public:
     void run() {
-        init_alias_marks();
+        need(fact::alias_marks);
         for (BBLK* bb = currfuninfo->bb_list; bb && goes_on; bb = only_way(bb))
             for (LIST** link = &bb->statements; *link && goes_on;) {
                 LIST* s = *link;

@@ -15,6 +15,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -287,8 +288,8 @@ private:
 
 void elim_dead_subrange_assigns() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
-    init_aliasing_info(true);
+    need(fact::alias);
     DEAD_STORES stores;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) stores.run(bb);
-    reset_alias_info();
+    changed(fact::graph);
 }

@@ -10,6 +10,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -164,7 +165,7 @@ void optimize_superblocks_in_cfg() {
     FUNINFO* f = currfuninfo;
     if (!f || !f->bb_list || pass_disable_superblock_opt) return;
     if (print_debug) debug_printf("\n\n\t\t\t------ ENTERING 'optimize_superblocks_in_cfg' ------\n");
-    init_alias_marks();
+    need(fact::alias_marks);
     bool changed = false;
     const auto superblocks = form_superblocks();
     for (const auto& superblock : superblocks) {

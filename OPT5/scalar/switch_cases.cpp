@@ -10,6 +10,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -328,7 +329,7 @@ void optimize_SWITCH_cases() {
             switches.push_back(bb);
     }
     if (switches.empty()) return;
-    init_aliasing_info(false);
+    need(fact::alias_marks | fact::pointees);
     bool changed = false;
     for (BBLK* bb : switches) changed |= SWITCH_CASES(bb, bb->last_statement()).run();
     if (changed) rebuildcfg();

@@ -8,6 +8,7 @@
 // returns truth values alone, where the rest of `a && b` or `a || b` is the call: such a return is taken apart first.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -86,7 +87,7 @@ public:
         if (!changed) return;
         sym_split(f);
         rebuildcfg();
-        reset_alias_info();
+        ::changed(fact::none);
     }
 
 private:
@@ -211,7 +212,7 @@ private:
                 if (bb == currfuninfo->bb_list && s == bb->statements && tree_is_arg_prolog(s->first)) continue;
                 if (reads_parameter_record(s->first) || calls_setjmp(s->first)) return false;
             }
-        init_aliasing_info(false);
+        need(fact::alias_marks | fact::pointees);
         bool is_private = true;
         for_each_local([&](const SYMTAB* s) { is_private &= !s->is_aliased(); });
         return is_private;

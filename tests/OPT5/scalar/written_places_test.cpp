@@ -310,7 +310,7 @@ TEST(WrittenPlaces, Signs) {
         "what is known of signs",
         [](WORLD& w) {
             w.build_store_write_load();
-            init_alias_marks();
+            init_aliasing_info(false);
             return !KNOWN_SIGNS().is_nonnegative(w.keep(w.name(w.x)));
         },
         true);

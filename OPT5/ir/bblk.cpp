@@ -5,6 +5,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "UTIL/abort.h"
 
@@ -28,7 +29,10 @@ const char* BBLK::str() const {
     return out;
 }
 
-LIST* BBLK::last_statement() const { return last_cell(statements); }
+LIST* BBLK::last_statement() const {
+    if (!control || control->rest) control = last_cell(control ? control : statements);
+    return control;
+}
 
 NODE* BBLK::branch() const {
     const LIST* last = last_statement();
@@ -159,8 +163,7 @@ void delink_old_bb(BBLK* bb) {
 }
 
 void erase_bblock(BBLK* bb) {
-    erase_tree_list(bb->statements);
-    bb->statements = nullptr;
+    erase_statements(bb);
     for (LBL* lbl = bb->label; lbl;) {
         LBL* next = lbl->next;
         delete lbl;

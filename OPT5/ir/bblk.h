@@ -31,7 +31,7 @@ public:
     BBLK* dflink = nullptr;
     BBLK* rdflink = nullptr;
     BBLK* uolink = nullptr;
-    LIST* statements = nullptr;
+    LIST* statements = nullptr; // changed through OPT5/ir/statements.h
     EDGE* predecessors = nullptr;
     EDGE* successors = nullptr;
     EDGE* cursor = nullptr;
@@ -53,12 +53,14 @@ public:
     bool visited = false;
     int cycle_count = -1;
 
+    mutable LIST* control = nullptr; // the cell that `last_statement` found; null: to be found
+
     explicit BBLK(FUNINFO* owner) : serial_object(owner) {}
     ~BBLK();
     FUNINFO* owner() const { return manager; }
     bool is_in_LIR_form() const { return fn != nullptr; }
     const char* str() const; // "BB<dfn>", with the serial number under debug:dump_serial; rotating static buffers
-    LIST* last_statement() const; // null for an empty block
+    LIST* last_statement() const; // null for an empty block; constant time but for the first call behind a new end
     NODE* branch() const;         // the tree of the last statement, or null
 };
 

@@ -106,6 +106,10 @@ private:
             error(" +++++ %s has no statement list\n", bb->str());
             return;
         }
+        if (bb->control && bb->last_statement() != last_cell(bb->statements)) {
+            error(" +++++ %s remembers a control statement that is not its last\n", bb->str());
+            bb->control = nullptr;
+        }
         NODE* branch = bb->branch();
         switch (branch->op) {
         case RETURN:

@@ -45,14 +45,3 @@ LIST* last_cell(LIST* list) {
 NODE* nl_left_child(const NODELIST* list) { return list ? list->first->left : nullptr; }
 NODE* list_left_child(const LIST* list) { return list ? list->first->left : nullptr; }
 NODE* pair_left_child(const NODEPAIRLIST* list) { return list ? list->a->left : nullptr; }
-
-void drop_empty_cells(LIST** list) {
-    while (LIST* cell = *list) {
-        if (cell->first) {
-            list = &cell->rest;
-            continue;
-        }
-        *list = cell->rest;
-        delete cell;
-    }
-}

@@ -45,4 +45,3 @@ LIST* mklist(NODE* tree, LIST* rest, uint16_t flag1, uint16_t flag2);
 LLIST* mklistlist(LIST* list, LLIST* next);
 LIST* reverse_list(LIST* list);     // in place
 LIST* last_cell(LIST* list);        // null for an empty list
-void drop_empty_cells(LIST** list); // those whose tree went

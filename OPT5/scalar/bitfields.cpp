@@ -15,6 +15,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
@@ -416,7 +417,7 @@ void EXPANSION::run() {
         LIST** link = &entry->statements;
         while (*link && tree_is_arg_prolog((*link)->first)) link = &(*link)->rest;
         NODE* zero = mk_ASG(mk_NAME(variable, variable->scope), mk_ICON(INT65(0), variable->type));
-        *link = mkelist(zero, *link, *link ? (*link)->psn : nullptr);
+        insert_before(link, zero, (*link)->psn);
     }
 }
 

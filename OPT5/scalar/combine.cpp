@@ -10,6 +10,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/simp.h"
@@ -195,8 +196,7 @@ void combine_asgs_to_memory() {
             if (s->first) {
                 link = &s->rest; // the temporary's definition stands in front of the store
             } else {
-                *link = s->rest;
-                delete s;
+                drop_statement(link);
             }
         }
     if (combined) changed(fact::graph);

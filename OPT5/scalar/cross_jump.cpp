@@ -7,6 +7,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 
 #include <map>
@@ -36,9 +37,9 @@ void print_block(const BBLK* bb) {
 void jump_instead(BBLK* later, BBLK* earlier) {
     PSN* psn = later->statements->psn;
     LS* ls = later->statements->first->ls;
-    erase_tree_list(later->statements);
+    erase_statements(later);
     while (later->successors) disconnect(later, later->successors->first);
-    later->statements = mkelist(mk_BRANCH(earlier, ls), nullptr, psn);
+    set_statements(later, mkelist(mk_BRANCH(earlier, ls), nullptr, psn));
     if (currfuninfo->exit_bb == later) currfuninfo->exit_bb = earlier;
     connect(later, earlier);
 }

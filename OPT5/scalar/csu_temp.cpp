@@ -14,6 +14,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
@@ -119,9 +120,7 @@ private:
     LIST** rewrite_statement(LIST** link) const {
         LIST* s = *link;
         if (is_copy(s->first)) {
-            *link = s->rest;
-            erase_tree(s->first);
-            delete s;
+            drop_statement(link);
             return link;
         }
         s->first = rewrite_tree(s->first, [this](NODE* t) { return substitute(t); });
@@ -180,9 +179,7 @@ void hand_results_over() {
             debug_printf("\nsubst_csu_returning_temp_for_local_var()\n  is substituting %s\n    for temporary  %s\n\n",
                          copy->first->left->u.sym->name, temp->name);
         std::swap(s->first->left, copy->first->left);
-        s->rest = copy->rest;
-        erase_tree(copy->first);
-        delete copy;
+        drop_statement_behind(s);
     }
 }
 

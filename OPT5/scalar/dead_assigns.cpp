@@ -14,6 +14,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/delay.h"
@@ -172,16 +173,13 @@ private:
 
     // The variables are read and written by the call; the one that held the value is not live in front of it.
     void replace_by_swap(LIST* s, int saved) {
-        LIST *first = s->rest, *second = first->rest;
+        const LIST* first = s->rest;
         for (const NODE* name : {s->first->right, first->first->right})
             if (int bit = live_index(name->u.sym); bit >= 0) live.set(static_cast<uint32_t>(bit));
         live.clear(static_cast<uint32_t>(saved));
         NODE* swap = make_swap(s->first->right, first->first->right);
-        s->rest = second->rest;
-        for (LIST* gone : {first, second}) {
-            erase_tree(gone->first);
-            delete gone;
-        }
+        drop_statement_behind(s);
+        drop_statement_behind(s);
         erase_tree(s->first);
         s->first = swap;
     }
@@ -257,8 +255,8 @@ bool combine_assignments(LIST* cell) {
     erase_tree(second->right);
     second->right = coerce_to_type(second->left->type, value);
     cell->first = simp_tree(second, nullptr);
-    cell->rest = next->rest;
-    delete next;
+    next->first = nullptr;
+    drop_statement_behind(cell);
     return true;
 }
 
@@ -344,8 +342,6 @@ void fold_ANDBASGs() {
             }
             NODE* mask = s->first->right;
             mask->u.lval = truncate_to_type(mask->u.lval & next->first->right->u.lval, mask->type);
-            erase_tree(next->first);
-            s->rest = next->rest;
-            delete next;
+            drop_statement_behind(s);
         }
 }

@@ -11,6 +11,7 @@
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/simp/seq.h"
@@ -97,12 +98,13 @@ private:
             target = split_cfg_edge(bb, target, false);
             split = true;
         }
-        (before ? before->rest : bb->statements) = cell->rest;
-        cell->rest = target->statements;
-        target->statements = cell;
+        NODE* assignment = cell->first;
+        insert_before(&target->statements, assignment, cell->psn);
+        cell->first = nullptr;
+        drop_statement(before ? &before->rest : &bb->statements);
         BITVEC& in = *target->live_sets[LIVE_IN];
-        in.clear(static_cast<uint32_t>(live_index(cell->first->left->u.sym)));
-        for_each_node(cell->first->right, [&in](const NODE* t) {
+        in.clear(static_cast<uint32_t>(live_index(assignment->left->u.sym)));
+        for_each_node(assignment->right, [&in](const NODE* t) {
             if (t->op != NAME) return;
             if (int bit = live_index(t->u.sym); bit >= 0) in.set(static_cast<uint32_t>(bit));
         });

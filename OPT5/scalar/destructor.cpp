@@ -11,6 +11,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/simp.h"
 
@@ -91,7 +92,6 @@ void remove_unneeded_stores_from_destructor() {
                 link = &s->rest;
                 continue;
             }
-            *link = s->rest;
-            delete s;
+            drop_statement(link);
         }
 }

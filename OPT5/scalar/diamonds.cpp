@@ -8,6 +8,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
@@ -111,7 +112,7 @@ void replace_test(BBLK* bb, LIST* test, NODE* statement, BBLK* join) {
     erase_tree(test->first);
     test->first = statement;
     if (!join) return;
-    test->rest = mkelist(mk_BRANCH(join, ls), nullptr, test->psn);
+    end_block_with(bb, test, mk_BRANCH(join, ls));
     connect(bb, join);
 }
 

@@ -10,6 +10,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
@@ -250,7 +251,7 @@ private:
             if (i == 0)
                 s->first = copy;
             else
-                last = last->rest = mkelist(copy, last->rest, s->psn);
+                last = insert_behind(last, copy, s->psn);
         }
         return &last->rest;
     }

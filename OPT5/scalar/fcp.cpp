@@ -18,6 +18,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -369,8 +370,7 @@ void SWEEP::rewrite() {
                 link = &s->rest;
                 continue;
             }
-            *link = s->rest;
-            delete s;
+            drop_statement(link);
         }
 }
 

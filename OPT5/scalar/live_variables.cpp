@@ -13,6 +13,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
@@ -44,28 +45,22 @@ void number_candidates() {
     f->lva_sym_count = count;
 }
 
-// The control statement of the block stands behind every other one, so there is always a next cell to move up.
-void drop_statement(LIST* s) {
-    LIST* next = s->rest;
-    *s = *next;
-    delete next;
-}
-
 // A COMMAOP at the top of a statement is a sequence of statements.
 void split_statements() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s;) {
+        for (LIST** link = &bb->statements; *link;) {
+            LIST* s = *link;
             if (s->first->op != COMMAOP) {
-                s = s->rest;
+                link = &s->rest;
                 continue;
             }
             NODE* comma = s->first;
             NODE *first = peel_for_effect(comma->left), *second = peel_for_effect(comma->right);
             comma->left = comma->right = nullptr;
             erase_node(comma);
-            if (first && second) s->rest = mkelist(second, s->rest, s->psn);
+            if (first && second) insert_behind(s, second, s->psn);
             s->first = first ? first : second;
-            if (!s->first) drop_statement(s);
+            if (!s->first) drop_statement(link);
         }
 }
 

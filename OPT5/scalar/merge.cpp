@@ -17,6 +17,7 @@
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -367,7 +368,7 @@ SYMTAB* MERGE::make_temporary(NODE* value) {
     TYPE* type = value->type->stqs();
     SYMTAB* sym = sym_temp('P', -1, type, nullptr);
     sym->set_bitnum(NOT_A_CANDIDATE);
-    put_at_end(ahead, maketree(ASG, mk_NAME(sym), value, type));
+    insert_at_end_of_body(ahead, maketree(ASG, mk_NAME(sym), value, type));
     return sym;
 }
 
@@ -414,7 +415,7 @@ void MERGE::step_beside(const GROUP& g) {
         for (const INDUCTION::STEP& step : i.steps) {
             LIST* s = step.bb->statements;
             while (s->first != step.statement) s = s->rest;
-            s->rest = mkelist(step.statement, s->rest, s->psn);
+            insert_behind(s, step.statement, s->psn);
             const int64_t by = coefficient * step.by;
             s->first = maketree(by < 0 ? MINUSASG : PLUSASG, mk_NAME(g.sym), step_size(step, by < 0 ? -by : by), g.type,
                                 step.statement->ls);
@@ -510,9 +511,7 @@ bool remove_statement(BBLK* bb, const NODE* statement) {
     for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
         LIST* cell = *link;
         if (cell->first != statement) continue;
-        *link = cell->rest;
-        erase_tree(cell->first);
-        delete cell;
+        drop_statement(link);
         return true;
     }
     return false;

@@ -152,15 +152,3 @@ BBLK* NATURAL_LOOPS::block_ahead(NATURAL_LOOP* loop) {
     for (NATURAL_LOOP* outer = loop->parent; outer; outer = outer->parent) outer->blocks.push_back(ahead);
     return ahead;
 }
-
-LIST** end_of_body(BBLK* bb) {
-    LIST** end = &bb->statements;
-    for (LIST** link = &bb->statements; *link && (*link)->rest; link = &(*link)->rest)
-        if ((*link)->first->op != PPRAGMA) end = &(*link)->rest;
-    return end;
-}
-
-void put_at_end(BBLK* bb, NODE* statement) {
-    LIST** link = end_of_body(bb);
-    *link = mkelist(statement, *link, (*link)->psn);
-}

@@ -51,8 +51,3 @@ private:
     std::vector<NATURAL_LOOP*> innermost; // by block
     bool split = false;
 };
-
-// The link in front of the statement that ends a block, and of the promises that belong to it: where a statement can be
-// put at the block's end.
-LIST** end_of_body(BBLK* bb);
-void put_at_end(BBLK* bb, NODE* statement);

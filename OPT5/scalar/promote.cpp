@@ -11,6 +11,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/seq.h"
@@ -245,12 +246,9 @@ bool is_left_alone(const NODE* t) {
 
 // Puts the statements around `s`, whose cell keeps its place at the end of what comes before it. The last cell.
 LIST* insert_around(LIST** link, LIST* s, const PROMOTER& promoter) {
-    for (NODE* t : promoter.before) {
-        *link = mkelist(t, s, s->psn);
-        link = &(*link)->rest;
-    }
+    for (NODE* t : promoter.before) link = insert_before(link, t, s->psn);
     LIST* last = s;
-    for (NODE* t : promoter.behind) last = last->rest = mkelist(t, last->rest, s->psn);
+    for (NODE* t : promoter.behind) last = insert_behind(last, t, s->psn);
     return last;
 }
 
@@ -267,7 +265,7 @@ bool block_has_embedded(const BBLK* bb) {
 // The statement `a, b` becomes two.
 void open_comma(LIST* s) {
     NODE* comma = s->first;
-    s->rest = mkelist(comma->right, s->rest, s->psn);
+    insert_behind(s, comma->right, s->psn);
     s->first = comma->left;
     erase_node(comma);
 }

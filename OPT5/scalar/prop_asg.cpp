@@ -6,6 +6,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/natural_loops.h"
 #include "OPT5/target/target.h"
@@ -34,8 +35,8 @@ void prop_asg_into_if(BBLK* bb) {
         if (!read || (*read)->u.sym != asg->left->u.sym) return;
         erase_tree(*read);
         *read = asg;
-        *link = test;
-        delete s;
+        s->first = nullptr;
+        drop_statement(link);
         return;
     }
 }

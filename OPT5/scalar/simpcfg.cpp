@@ -11,6 +11,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/seq.h"
@@ -86,9 +87,7 @@ void drop_promises_of(BBLK* loop) {
                 link = &s->rest;
                 continue;
             }
-            *link = s->rest;
-            erase_tree(s->first);
-            delete s;
+            drop_statement(link);
         }
     }
 }
@@ -167,8 +166,8 @@ private:
             BBLK* dead = work.back();
             work.pop_back();
             if (!is_live(dead)) continue;
-            erase_tree_list(dead->statements);
-            dead->statements = control_of(dead) = nullptr;
+            erase_statements(dead);
+            control_of(dead) = nullptr;
             while (dead->successors) {
                 BBLK* next = dead->successors->first;
                 disconnect(dead, next);
@@ -251,7 +250,8 @@ private:
         cell->rest = first->rest;
         control_of(bb) = control_of(next) == first ? cell : control_of(next);
         delete first;
-        next->statements = control_of(next) = nullptr;
+        control_of(next) = nullptr;
+        set_statements(next, nullptr);
 
         disconnect(bb, next);
         bb->successors = next->successors;
@@ -279,7 +279,7 @@ void make_branch(BBLK* bb, LIST* control, BBLK* target) {
     control->first = mk_BRANCH(target, ls);
     if (effects) {
         // The cell is the block's last: the effects take it, and the branch gets a new one behind.
-        control->rest = mkelist(control->first, nullptr, control->psn);
+        end_block_with(bb, control, control->first);
         control->first = effects;
     }
     for (EDGE* e = bb->successors; e;) {
@@ -338,7 +338,7 @@ BBLK* split_block(BBLK* bb, LIST* cell, bool renumber) {
     LIST* behind = cell->rest;
     OPT_ASSERT(behind != nullptr);
     BBLK* next = insert_new_bb(-1, bb, behind);
-    cell->rest = mkelist(mk_BRANCH(next), nullptr, cell->psn);
+    end_block_with(bb, cell, mk_BRANCH(next));
     next->first_psn = behind->psn;
     next->last_psn = bb->last_psn;
     next->dFreqIn = next->dFreqOut = bb->dFreqOut;

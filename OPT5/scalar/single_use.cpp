@@ -8,6 +8,7 @@
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/eda.h"
@@ -58,9 +59,7 @@ private:
                 link = &cell->rest;
                 continue;
             }
-            *link = cell->rest;
-            erase_tree(cell->first);
-            delete cell;
+            drop_statement(link);
         }
     }
 

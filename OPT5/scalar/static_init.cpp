@@ -11,6 +11,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
@@ -101,9 +102,7 @@ public:
                     link = &s->rest;
                     continue;
                 }
-                *link = s->rest;
-                erase_tree(s->first);
-                delete s;
+                drop_statement(link);
             }
         for (SYMTAB* s : order) initialize(s);
         if (!order.empty()) settle_dynamic_init();

@@ -11,6 +11,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
@@ -225,10 +226,9 @@ private:
         LIST* first = entry->statements;
         if (tree_is_arg_prolog(first->first)) return start_bb = split_block(entry, first, false);
         // Without parameters the start is all of the block; what it is split behind goes again.
-        entry->statements = first = mkelist(nullptr, first, first->psn);
-        start_bb = split_block(entry, first, false);
-        entry->statements = first->rest;
-        delete first;
+        insert_before(&entry->statements, nullptr, first->psn);
+        start_bb = split_block(entry, entry->statements, false);
+        drop_statement(&entry->statements);
         return start_bb;
     }
 
@@ -295,6 +295,7 @@ private:
         while (*link != cell) link = &(*link)->rest;
         erase_tree_list(cell);
         *link = tail;
+        set_statements(bb, bb->statements);
     }
 
     // Each value goes through a temporary, or away if only its effects count.

@@ -113,6 +113,9 @@ class Body(Writer):
         self.fours += ["*pp", "v.c", "last", "v.p"]
         self.scope.scalars += [Var(t, SMALL) for t in ("*o", "t->a", "v.a", "t->next->c[2]", "v.c[1]", "**pp", "kept", "*last")]
         self.scope.scalars += [Var("t->w", WIDE), Var("v.w", WIDE)]
+        # A few names come up again and again, so that they meet.
+        self.scope.scalars += 5 * rng.sample([v for v in self.scope.scalars if v.kind == SMALL and v.writable], 7)
+        self.scope.scalars += 3 * [Var(t, SMALL) for t in ("*p", "*q", "*o", "x")]
 
     # ---- Statements
 
@@ -136,9 +139,18 @@ class Body(Writer):
         self.put(f"{left} = {right};" if rng.random() < 0.8 else f"{left} = same({right}, {self.value(SMALL, 1)});")
 
     def twice(self):
-        """A store, another by a name that may be the same, and a read."""
-        first, second = self.target((SMALL,)), self.target((SMALL,))
-        self.put(self.store(first, 1), self.store(second, 1), f"{self.target((SMALL,)).text} = {first.text};")
+        """One object by two names, perhaps: what the first is known to hold must not outlive a change by the second."""
+        rng, first, second, third = self.rng, *(self.target((SMALL,)) for _ in range(3))
+        known = f"{first.text} = {rng.choice((str(rng.randint(-9, 9)), 'n', 'x', self.value(SMALL, 1)))};"
+        if rng.random() < 0.2:
+            second = first
+        by_call = f"{rng.choice(('set', 'set', '(*action)'))}(&{second.text}, {self.value(SMALL, 1)});"
+        between = rng.choice((lambda: self.put(self.store(second, 1)), lambda: self.put(self.store(second, 1)), self.copy,
+                              self.call, lambda: self.put(by_call), lambda: self.put(f"{third.text} = {second.text};"), self.point))
+        self.put(rng.choice((known, known, f"{third.text} = {first.text};")))
+        between()
+        self.put(rng.choice((f"{third.text} = {first.text};", f"{third.text} = {first.text};", self.store(first, 1),
+                             f"if ({first.text} {rng.choice(('>', '==', '<='))} {rng.randint(-9, 9)}) {self.store(third, 1)}")))
 
     def characters(self):
         rng, name = self.rng, self.name("c")
@@ -250,7 +262,7 @@ class Body(Writer):
         self.put("}")
 
     def statement(self, depth=3):
-        simple = (self.plain, self.plain, self.twice, self.point, self.copy, self.call, self.characters, self.restricted)
+        simple = (self.plain, self.twice, self.twice, self.twice, self.point, self.copy, self.call, self.characters, self.restricted)
         compound = (self.choose, self.walk, self.count) if depth > 1 else ()
         self.rng.choice(simple + compound * 2)()
         self.cost += self.in_loop

@@ -4,8 +4,9 @@
 // lies in the residue class of c modulo the greatest common divisor g of the coefficients: two accesses that the whole
 // class keeps apart are disjoint. That tells x.a from y.b in arrays of structures, and p[2*i] from p[2*i + 1].
 //
-// Sums are opened only where they are exact: pointer arithmetic, and signed arithmetic, whose overflow is undefined. An
-// unsigned sum may wrap before it becomes part of a pointer, and stays one term.
+// Sums are opened where they are exact: pointer arithmetic, and signed arithmetic, which the simplifier keeps exact.
+// Unsigned ones of an address's width wrap where it does, and the classes are those of a divisor of the address space
+// then. A narrower one may wrap before it becomes part of a pointer, and stays one term.
 
 #include "OPT5/alias/address_form.h"
 
@@ -14,92 +15,75 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
-
-#include <cstddef>
+#include "OPT5/simp/exact.h"
 
 namespace {
 
-constexpr int MAX_TERMS = 16;
-constexpr int BITS_PER_UNIT = 16;
-
-void add_term(ADDRESS_FORM& form, const NODE* tree, INT65 coefficient) {
-    for (ADDRESS_TERM& term : form.terms) {
-        if (!trees_are_congruent(term.tree, tree, false)) continue;
-        term.coefficient += coefficient;
-        return;
-    }
-    form.terms.push_back({tree, coefficient});
-}
-
-bool is_exact_widening(const NODE* t) {
-    if (t->op != SCONV || !t->type->is_int() || !t->left->type->is_int()) return false;
-    return t->left->type->is_signed() && t->type->is_signed() && t->left->type->size <= t->type->size;
-}
-
-bool is_exact_sum(const NODE* t) { return t->type->is_pointer() || (t->type->is_int() && t->type->is_signed()); }
-
-// Adds `coefficient` times `t`, an integer.
-void add_integer(ADDRESS_FORM& form, const NODE* t, INT65 coefficient) {
-    for (;;) {
-        while (t->op == IDENTITY || is_exact_widening(t)) t = t->left;
-        if (t->op == ICON) {
-            form.offset += coefficient * t->u.lval;
-            return;
-        }
-        const bool opens = is_exact_sum(t) && !t->type->is_pointer() && form.terms.size() < MAX_TERMS;
-        if (opens && (t->op == PLUS || t->op == MINUS)) {
-            add_integer(form, t->right, t->op == PLUS ? coefficient : -coefficient);
-            t = t->left;
-        } else if (opens && t->op == MULT && t->right->op == ICON) {
-            coefficient = coefficient * t->right->u.lval;
-            t = t->left;
-        } else if (opens && t->op == SLL && t->right->op == ICON && t->right->u.lval < INT65(32) &&
-                   !t->right->u.lval.is_negative()) {
-            coefficient = coefficient << t->right->u.lval;
-            t = t->left;
-        } else if (opens && t->op == UMINUS) {
-            coefficient = -coefficient;
-            t = t->left;
-        } else {
-            add_term(form, t, coefficient);
-            return;
-        }
-    }
-}
+constexpr int BITS_PER_UNIT = 16, MOST_NODES = 64;
+constexpr unsigned ADDRESS_WIDTH = 32; // of an address as a number, which counts units
 
 void add_lvalue(ADDRESS_FORM& form, const NODE* t);
 
-void add_pointer(ADDRESS_FORM& form, const NODE* p) {
-    for (;;) {
-        switch (p->op) {
-        case IDENTITY:
-        case OUIALIGN:
-        case NONALIGN: p = p->left; continue;
-        case PCONV:
-        case ISP2CHAR:
-            if (p->left->op == ICON) {
-                form.offset += p->left->u.lval * INT65(BITS_PER_UNIT);
-                return;
-            }
-            if (!p->left->type->is_pointer()) break;
-            p = p->left;
-            continue;
-        case ICON: form.offset += p->u.lval * INT65(BITS_PER_UNIT); return;
-        case PLUS:
-        case MINUS: {
-            const bool swapped = p->op == PLUS && !p->left->type->is_pointer();
-            const NODE *base = swapped ? p->right : p->left, *index = swapped ? p->left : p->right;
-            if (!base->type->is_pointer() || index->type->is_pointer()) break;
-            add_integer(form, index, INT65(p->op == PLUS ? BITS_PER_UNIT : -BITS_PER_UNIT));
-            p = base;
-            continue;
-        }
-        case UAND: add_lvalue(form, p->left); return;
-        default: break;
-        }
-        add_term(form, p, INT65(BITS_PER_UNIT));
-        return;
+// Integers and pointers, in bits of the address.
+class READER final : public LINEAR_READER {
+public:
+    explicit READER(ADDRESS_FORM* f) : LINEAR_READER(f, MOST_NODES), address(*f) {}
+
+private:
+    const NODE* without_marks(const NODE* t) const override {
+        while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN) t = t->left;
+        return t;
     }
+    bool takes_constant(const NODE*) override { return true; }
+
+    bool opens(const NODE* t, const LINEAR_STEP&) override {
+        if (t->type->is_pointer()) return opens_pointer(t);
+        if (t->op == SCONV) return opens_cast(t);
+        if (t->op == MULT && t->right->op != ICON) return false;
+        if (t->op == PLUS || t->op == MINUS || t->op == UMINUS || t->op == MULT)
+            return is_exact_by_rule(t->op, t->type) || wraps(t);
+        return t->op == SLL && wraps(t);
+    }
+    static bool opens_pointer(const NODE* t) {
+        switch (t->op) {
+        case PCONV:
+        case ISP2CHAR: return t->left->type->is_pointer() || t->left->op == ICON;
+        case PLUS: return t->left->type->is_pointer() != t->right->type->is_pointer();
+        case MINUS: return t->left->type->is_pointer() && !t->right->type->is_pointer();
+        default: return false;
+        }
+    }
+    bool opens_cast(const NODE* t) {
+        const TYPE *to = t->type, *from = t->left->type;
+        if (!to->is_int() || !from->is_int() || from->size > to->size) return false;
+        return (from->is_signed() && to->is_signed()) || (from->size == to->size && wraps(t));
+    }
+    // Whether the operator wraps where an address does, and counts as one that may.
+    bool wraps(const NODE* t) {
+        auto is_as_wide = [](const NODE* n) {
+            return n->type->is_int() && !n->type->is_bool() && n->type->size == ADDRESS_WIDTH;
+        };
+        if (!is_as_wide(t) || !is_as_wide(t->left)) return false;
+        if ((t->op == PLUS || t->op == MINUS) && !is_as_wide(t->right)) return false;
+        form.is_exact = false;
+        return true;
+    }
+
+    bool leaf(const NODE* t, int64_t k) override {
+        if (t->op != UAND || !t->type->is_pointer() || k != BITS_PER_UNIT) return form.add(t, k);
+        add_lvalue(address, t->left);
+        return true;
+    }
+
+    ADDRESS_FORM& address;
+};
+
+// The tree as a term where it has more of them than fit.
+void add_value(ADDRESS_FORM& form, const NODE* t) {
+    const ADDRESS_FORM before = form;
+    if (READER(&form).read(t, BITS_PER_UNIT)) return;
+    form = before;
+    form.add(t, BITS_PER_UNIT);
 }
 
 const NODE* without_wrappers(const NODE* t) {
@@ -113,17 +97,17 @@ void add_lvalue(ADDRESS_FORM& form, const NODE* t) {
     for (;;) {
         t = without_wrappers(t);
         if ((t->op == STDOT || t->op == STREF) && t->right && t->right->mval) {
-            form.offset += INT65(t->right->mval->offset);
-            if (t->op == STREF) return add_pointer(form, t->left);
+            form.add_constant(t->right->mval->offset);
+            if (t->op == STREF) return add_value(form, t->left);
             t = t->left;
         } else if (t->op == UMULT) {
-            if (t->right) add_integer(form, t->right, INT65(BITS_PER_UNIT)); // base and subscript
-            return add_pointer(form, t->left);
+            if (t->right) add_value(form, t->right); // base and subscript
+            return add_value(form, t->left);
         } else if (t->op == NAME && t->u.sym && !form.object) {
             form.object = t->u.sym;
             return;
         } else {
-            add_term(form, t, INT65(BITS_PER_UNIT)); // not understood: a place of its own
+            form.add(t, BITS_PER_UNIT); // not understood: a place of its own
             return;
         }
     }
@@ -136,7 +120,7 @@ INT65 access_width(const NODE* t) {
     return INT65(static_cast<int64_t>(t->type->size));
 }
 
-INT65 magnitude(INT65 v) { return v.is_negative() ? -v : v; }
+INT65 magnitude(int64_t v) { return v < 0 ? -INT65(v) : INT65(v); }
 
 INT65 residue(INT65 v, INT65 modulus) {
     const INT65 r = v % modulus;
@@ -154,16 +138,16 @@ ADDRESS_FORM address_form(const NODE* lvalue) {
     form.width = access_width(lvalue);
     add_lvalue(form, lvalue);
     if (form.object || !currfuninfo) return form;
-    for (size_t i = 0; i < form.terms.size(); ++i) {
-        const NODE* p = form.terms[i].tree;
-        if (p->op != NAME || !p->type->is_pointer() || form.terms[i].coefficient != INT65(BITS_PER_UNIT)) continue;
+    for (const LINEAR_FORM::TERM& term : form) {
+        const NODE* p = term.tree;
+        if (p->op != NAME || !p->type->is_pointer() || term.coefficient != BITS_PER_UNIT) continue;
         const SPMAP& pointees = *currfuninfo->spmap;
         SYMTAB* object = pointees.object(p->u.sym);
         if (!object) continue;
         if (pointees.is_precise(p->u.sym)) {
             form.object = object;
-            form.offset += pointees.offset(p->u.sym) * INT65(BITS_PER_UNIT);
-            form.terms.erase(form.terms.begin() + static_cast<std::ptrdiff_t>(i));
+            form.add_constant((pointees.offset(p->u.sym) * INT65(BITS_PER_UNIT)).fits_in<int64_t>());
+            form.erase(&term);
         } else {
             form.points_into = object;
         }
@@ -172,26 +156,33 @@ ADDRESS_FORM address_form(const NODE* lvalue) {
     return form;
 }
 
+INT65 ADDRESS_FORM::modulus() const {
+    return is_exact ? INT65(0) : INT65(BITS_PER_UNIT) << INT65(static_cast<int64_t>(ADDRESS_WIDTH));
+}
+
 bool accesses_are_disjoint(const ADDRESS_FORM& a, const ADDRESS_FORM& b, struct LOOP* loop) {
     if (a.object != b.object || a.width <= INT65(0) || b.width <= INT65(0)) return false;
-    INT65 g; // of the coefficients of what does not cancel
-    std::vector<bool> is_matched(b.terms.size());
-    for (const ADDRESS_TERM& x : a.terms) {
+    // The greatest common divisor of the coefficients of what does not cancel, and of the address space where sums
+    // wrap.
+    INT65 g = long_gcd(a.modulus(), b.modulus());
+    bool is_matched[LINEAR_FORM::MOST_TERMS] = {};
+    for (const LINEAR_FORM::TERM& x : a) {
         INT65 coefficient = x.coefficient;
-        for (size_t i = 0; i < b.terms.size(); ++i) {
-            if (is_matched[i] || !trees_are_congruent(x.tree, b.terms[i].tree, false)) continue;
-            is_matched[i] = true;
+        for (const LINEAR_FORM::TERM& y : b) {
+            bool& is_taken = is_matched[&y - b.begin()];
+            if (is_taken || !trees_are_congruent(x.tree, y.tree, false)) continue;
+            is_taken = true;
             if (may_differ_in_loop(x.tree, loop))
-                g = long_gcd(g, magnitude(b.terms[i].coefficient));
+                g = long_gcd(g, magnitude(y.coefficient));
             else
-                coefficient -= b.terms[i].coefficient;
+                coefficient -= INT65(y.coefficient);
             break;
         }
-        g = long_gcd(g, magnitude(coefficient));
+        g = long_gcd(g, coefficient.is_negative() ? -coefficient : coefficient);
     }
-    for (size_t i = 0; i < b.terms.size(); ++i)
-        if (!is_matched[i]) g = long_gcd(g, magnitude(b.terms[i].coefficient));
-    const INT65 distance = b.offset - a.offset; // of b behind a
+    for (const LINEAR_FORM::TERM& y : b)
+        if (!is_matched[&y - b.begin()]) g = long_gcd(g, magnitude(y.coefficient));
+    const INT65 distance = INT65(b.constant) - INT65(a.constant); // of b behind a
     if (g.is_zero()) return distance >= a.width || -distance >= b.width;
     const INT65 behind = residue(distance, g);
     return behind >= a.width && g - behind >= b.width;

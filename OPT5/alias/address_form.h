@@ -1,29 +1,23 @@
-// An access as a place: a sum of terms, a constant, and a width.
+// An access as a place: the address of an object, a sum of terms and a constant, in bits, and a width.
 #pragma once
 
+#include "OPT5/simp/linear.h"
 #include "XINT/int65.h"
-
-#include <vector>
 
 class NODE;
 class SYMTAB;
 struct LOOP;
 
-// `coefficient` times the value of `tree`, in bits.
-struct ADDRESS_TERM {
-    const NODE* tree;
-    INT65 coefficient;
-};
+struct ADDRESS_FORM : LINEAR_FORM {
+    ADDRESS_FORM() : LINEAR_FORM(64) {}
 
-struct ADDRESS_FORM {
-    SYMTAB* object = nullptr;        // the address of this object is a term
-    SYMTAB* points_into = nullptr;   // a term is a pointer into this object; null with `object`
-    std::vector<ADDRESS_TERM> terms; // no two congruent
-    INT65 offset;                    // bits
-    INT65 width;                     // bits; 0: unknown
+    SYMTAB* object = nullptr;      // the address of this object is a term
+    SYMTAB* points_into = nullptr; // a term is a pointer into this object; null with `object`
+    INT65 width;                   // bits; 0: unknown
 
     SYMTAB* known_object() const { return object ? object : points_into; }
-    bool is_absolute() const { return !object && terms.empty(); }
+    INT65 modulus() const; // the sum is the address modulo this; 0: exactly
+    bool is_absolute() const { return !object && is_constant(); }
 };
 
 ADDRESS_FORM address_form(const NODE* lvalue);

@@ -31,10 +31,10 @@ bool is_marked_unaligned(const NODE* pointer) {
 
 // Of the place that a form stands for, down to one unit. `trusted`: pointers in it have the alignment of their types.
 unsigned alignment_of_form(const ADDRESS_FORM& form, bool trusted) {
-    INT65 g = form.offset.is_negative() ? -form.offset : form.offset;
+    INT65 g = long_gcd(form.modulus(), form.constant < 0 ? -INT65(form.constant) : INT65(form.constant));
     if (form.object) g = long_gcd(g, INT65(std::max(form.object->align, alignment_of(form.object->type))));
-    for (const ADDRESS_TERM& term : form.terms) {
-        const INT65 scale = term.coefficient.is_negative() ? -term.coefficient : term.coefficient;
+    for (const LINEAR_FORM::TERM& term : form) {
+        const INT65 scale = term.coefficient < 0 ? -INT65(term.coefficient) : INT65(term.coefficient);
         const bool is_base = term.tree->type->is_pointer() && scale == INT65(UNIT);
         g = long_gcd(g, is_base && trusted ? INT65(type_promise(term.tree)) : scale);
     }

@@ -59,9 +59,9 @@ NODE* initial_content(const NODE* access) {
     if (!sym->autoinit || !sym->type->is_const() || lvalue_is_volatile(access)) return nullptr;
     if (!is_plain_scalar(access->type)) return nullptr;
     const ADDRESS_FORM place = address_form(access);
-    if (place.object != sym || !place.terms.empty() || place.offset.is_negative()) return nullptr;
+    if (place.object != sym || !place.is_constant() || place.constant < 0) return nullptr;
     if (place.width != INT65(static_cast<int64_t>(access->type->size))) return nullptr; // a bit-field
-    const int64_t at = place.offset.fits_in<int64_t>(), width = static_cast<int64_t>(access->type->size);
+    const int64_t at = place.constant, width = static_cast<int64_t>(access->type->size);
     if (at + width > static_cast<int64_t>(sym->size)) return nullptr;
     if (!symbol_is_immutable(sym) && !bits_of_var_are_immutable(sym->type, at, width)) return nullptr;
     return lookup_autoinit(sym, static_cast<uint64_t>(at), access->type);

@@ -53,6 +53,7 @@ public:
     int mentions(const SYMTAB* sym) const;       // NAMEs in the loop
     bool is_used_after(const SYMTAB* sym) const; // its value may be read where the loop is left
 
+    using LINEAR_LEAVES::is_induction;
     bool is_induction(const SYMTAB* sym) const override { return inductions.count(sym) != 0; }
     bool is_invariant(const NODE* tree) override;
     // Of a variable with one assignment in the loop, at the statement that `look_at` named: what that assigned in the

@@ -2,8 +2,7 @@
 //
 // A signed variable that only its name reaches holds what its assignments give it. If each gives a value that is not
 // negative as long as the variables in it are not, no variable ever is: the first negative one would have come of
-// others. The sums and products of signed numbers are those of the numbers themselves, since a program whose signed
-// arithmetic overflows has no meaning.
+// others. The sums and products of signed numbers are those of the numbers themselves (OPT5/simp/exact.h).
 #include "OPT5/scalar/known_signs.h"
 
 #include "OPT5/alias/alias.h"

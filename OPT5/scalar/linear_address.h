@@ -1,24 +1,17 @@
 // An address that moves by constant steps when the inductions of a loop do.
 #pragma once
 
-#include <cstdint>
-#include <vector>
+#include "OPT5/simp/linear.h"
 
 class NODE;
 class SYMTAB;
 class TYPE;
 
-// base + the sum of coefficient * leaf + offset, in address units and in arithmetic that wraps at the width of an
-// address. A leaf has the value of its own type. Trees are borrowed.
-struct LINEAR_ADDRESS {
-    struct TERM {
-        const NODE* leaf;
-        int64_t coefficient;
-        bool is_induction;
-    };
+// base + a sum of invariants and inductions, in address units and modulo the width of an address. Trees are borrowed.
+struct LINEAR_ADDRESS : LINEAR_FORM {
+    LINEAR_ADDRESS();
+
     const NODE* base = nullptr; // of pointer type
-    std::vector<TERM> terms;    // no two congruent, none with coefficient 0
-    int64_t offset = 0;
 
     bool is_induction_by(const SYMTAB* sym) const;
     int64_t coefficient_of(const SYMTAB* sym) const; // of the term that is the variable; 0 without one
@@ -36,12 +29,14 @@ public:
     virtual const NODE* value_of(const SYMTAB* sym) = 0;
     // Whether the value of a narrow induction also moves by its steps when it is widened.
     virtual bool stays_linear_when_widened(const SYMTAB* sym) const = 0;
+
+    bool is_induction(const NODE* term) const;
 };
 
 // Takes a tree of pointer type apart; false if a part of it is no constant, invariant or induction.
 //
-// A signed sum in a type narrower than an address is taken to be exact, as the language promises, and so are the steps
-// of a signed induction; an unsigned one wraps.
+// A signed sum in a type narrower than an address is exact, as the simplifier keeps it, and so are the steps of a
+// signed induction; an unsigned one wraps.
 bool linear_address(const NODE* pointer, LINEAR_LEAVES& leaves, LINEAR_ADDRESS* address);
 
 // A fresh tree with the address's value, of pointer type `type`. A value for the inductions that are `sym` may be

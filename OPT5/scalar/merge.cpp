@@ -63,7 +63,7 @@ struct GROUP {
     bool steps = false, stays_based = false;
     SYMTAB* sym = nullptr;
 
-    int64_t skew(const USE& use) const { return use.address.offset - address.offset; }
+    int64_t skew(const USE& use) const { return use.address.constant - address.constant; }
 };
 
 std::string text_of(int64_t v) { return std::to_string(v); }
@@ -105,10 +105,10 @@ private:
     bool enter(NODE** place) {
         USE use{place, block, statement, {}, weight, 0};
         if (!linear_address(*place, facts, &use.address)) return false;
-        const auto& terms = use.address.terms;
-        const bool moves = std::any_of(terms.begin(), terms.end(), [](const auto& t) { return t.is_induction; });
+        const bool moves = std::any_of(use.address.begin(), use.address.end(),
+                                       [&](const auto& t) { return facts.is_induction(t.tree); });
         // A pointer that steps by itself is as good as one that steps beside it.
-        if (!moves && (terms.empty() || !facts.is_induction(base_symbol(use.address)))) return false;
+        if (!moves && (use.address.is_constant() || !facts.is_induction(base_symbol(use.address)))) return false;
         use.nodes = count_nodes_in_tree(*place);
         group_for(use).uses.push_back(std::move(use));
         return true;
@@ -179,11 +179,11 @@ void MERGE::split_by_offsets() {
     std::vector<GROUP> parts;
     for (GROUP& g : groups) {
         std::stable_sort(g.uses.begin(), g.uses.end(),
-                         [](const USE& a, const USE& b) { return a.address.offset < b.address.offset; });
+                         [](const USE& a, const USE& b) { return a.address.constant < b.address.constant; });
         GROUP part;
         for (USE& use : g.uses) {
-            const int64_t low = part.uses.empty() ? use.address.offset : part.uses.front().address.offset;
-            if (!offset_is_in_range(INT65(use.address.offset - low), (*use.place)->type, 1)) {
+            const int64_t low = part.uses.empty() ? use.address.constant : part.uses.front().address.constant;
+            if (!offset_is_in_range(INT65(use.address.constant - low), (*use.place)->type, 1)) {
                 if (print_debug) {
                     debug_printf("\n\tSplitting SRIV %s ==> %s\n", tree_to_infix(*part.uses.front().place).c_str(),
                                  tree_to_infix(*use.place).c_str());
@@ -207,13 +207,12 @@ double cost_of_tree(const NODE* t) {
 }
 
 // The address without what moves; what moves alone; a constant that belongs to the part that stays.
-LINEAR_ADDRESS without_inductions(LINEAR_ADDRESS a) {
-    a.terms.erase(std::remove_if(a.terms.begin(), a.terms.end(), [](const auto& t) { return t.is_induction; }),
-                  a.terms.end());
+LINEAR_ADDRESS without_inductions(LINEAR_ADDRESS a, const LOOP_FACTS& facts) {
+    a.keep_if([&](const auto& t) { return !facts.is_induction(t.tree); });
     return a;
 }
 
-bool is_trivial(const LINEAR_ADDRESS& a) { return a.terms.empty() && (a.offset == 0 || a.base->op == UAND); }
+bool is_trivial(const LINEAR_ADDRESS& a) { return a.is_constant() && (a.constant == 0 || a.base->op == UAND); }
 
 void MERGE::appraise(GROUP& g) {
     g.address = g.uses.front().address;
@@ -236,9 +235,9 @@ void MERGE::appraise(GROUP& g) {
         }
     };
     if (base_moves) add_steps(g.address.base->u.sym);
-    for (const auto& t : g.address.terms) {
-        if (!t.is_induction) continue;
-        add_steps(t.leaf->u.sym);
+    for (const auto& t : g.address) {
+        if (!facts.is_induction(t.tree)) continue;
+        add_steps(t.tree->u.sym);
         moving += t.coefficient == 1 || t.coefficient == -1 ? 2 : 5 + MULTIPLY_COST;
     }
     for (const USE& use : g.uses) {
@@ -252,7 +251,7 @@ void MERGE::appraise(GROUP& g) {
     g.step_growth += g.uses.front().nodes + 6;
     g.base_growth += g.uses.front().nodes + 2;
     g.step_gain -= stepping;
-    if (base_moves || is_trivial(without_inductions(g.address))) g.base_gain = -1;
+    if (base_moves || is_trivial(without_inductions(g.address, facts))) g.base_gain = -1;
     g.entry_cost = 2 + cost_of_tree(*g.uses.front().place);
 }
 
@@ -268,8 +267,9 @@ const GROUP* MERGE::carrier(const LOOP_TEST& test) const {
     for (const GROUP& g : groups) {
         const int64_t k = g.address.coefficient_of(i.sym);
         if (k == 0) continue;
-        const bool only = std::all_of(g.address.terms.begin(), g.address.terms.end(),
-                                      [&](const auto& t) { return !t.is_induction || t.leaf->u.sym == i.sym; });
+        const bool only = std::all_of(g.address.begin(), g.address.end(), [&](const auto& t) {
+            return !facts.is_induction(t.tree) || t.tree->u.sym == i.sym;
+        });
         const bool base_moves = g.address.base->op == NAME && facts.is_induction(g.address.base->u.sym);
         if (!only || base_moves) continue;
         // Different counts give different addresses.
@@ -344,8 +344,9 @@ void MERGE::choose() {
 NODE* MERGE::start_tree(const GROUP& g) {
     LINEAR_ADDRESS start = g.address;
     const INDUCTION* known = nullptr;
-    for (const auto& t : start.terms)
-        if (t.is_induction && facts.induction(t.leaf->u.sym)->start_is_known) known = facts.induction(t.leaf->u.sym);
+    for (const auto& t : start)
+        if (facts.is_induction(t.tree) && facts.induction(t.tree->u.sym)->start_is_known)
+            known = facts.induction(t.tree->u.sym);
     if (!known) return tree_of_address(start, g.type);
     NODE* value = mk_ICON(INT65(known->start), known->sym->type->stqs());
     NODE* tree = tree_of_address(start, g.type, known->sym, value);
@@ -388,7 +389,7 @@ void MERGE::replace(const GROUP& g, USE& use, NODE* by, int form) {
     if (skew) {
         if (print_debug)
             debug_printf("\n\t(%d) Skewing %s: high = %s, low = %s, skew = %s\n", form, tree_to_infix(old).c_str(),
-                         text_of(g.uses.back().address.offset).c_str(), text_of(g.address.offset).c_str(),
+                         text_of(g.uses.back().address.constant).c_str(), text_of(g.address.constant).c_str(),
                          text_of(skew).c_str());
         skewed_offset_syms.insert(g.sym);
         by = maketree(PLUS, by, mk_ICON(INT65(skew), skew <= 32767 ? tp->int_t : tp->long_t), by->type, old->ls);
@@ -423,8 +424,8 @@ void MERGE::step_beside(const GROUP& g) {
     };
     const LINEAR_ADDRESS& a = g.address;
     if (a.base->op == NAME && facts.is_induction(a.base->u.sym)) add(*facts.induction(a.base->u.sym), 1);
-    for (const auto& t : a.terms)
-        if (t.is_induction) add(*facts.induction(t.leaf->u.sym), t.coefficient);
+    for (const auto& t : a)
+        if (facts.is_induction(t.tree)) add(*facts.induction(t.tree->u.sym), t.coefficient);
 }
 
 void MERGE::rewrite(GROUP& g) {
@@ -445,14 +446,14 @@ void MERGE::rewrite(GROUP& g) {
 
 // The part that stays goes ahead of the loop.
 void MERGE::rewrite_with_base(GROUP& g) {
-    const LINEAR_ADDRESS stays = without_inductions(g.address);
+    const LINEAR_ADDRESS stays = without_inductions(g.address, facts);
     g.sym = make_pointer(g.type, stays, tree_of_address(stays, g.type));
     if (print_debug) debug_printf("\n\tCreating base temp %s in BB%d\n", g.sym->name, ahead->dfn);
     NODE* base = mk_NAME(g.sym);
     LINEAR_ADDRESS moves;
     moves.base = base;
-    for (const auto& t : g.address.terms)
-        if (t.is_induction) moves.terms.push_back(t);
+    for (const auto& t : g.address)
+        if (facts.is_induction(t.tree)) moves.add(t.tree, t.coefficient);
     for (USE& use : g.uses) replace(g, use, tree_of_address(moves, g.type), 1);
     erase_tree(base);
 }
@@ -473,7 +474,7 @@ NODE* MERGE::last_address(const LOOP_TEST& test, const GROUP& g) {
     }
     LINEAR_ADDRESS end = g.address;
     const bool includes_limit = test.stay_op == LE || test.stay_op == GE || test.stay_op == ULE || test.stay_op == UGE;
-    if (includes_limit) end.offset += k * by;
+    if (includes_limit) end.constant += k * by;
     NODE* address = tree_of_address(end, g.type, i.sym, test.limit);
     if (test.stay_op == NEQ) return address;
 

@@ -138,11 +138,12 @@ private:
         if (lvalue_is_volatile(t->left)) return false;
         const ADDRESS_FORM place = address_form(t->left);
         SYMTAB* s = place.object;
-        if (!s || !place.terms.empty() || barred.count(s) || (reached && file_symbol_may_be_aliased(s))) return false;
+        if (!s || !place.is_constant() || barred.count(s) || (reached && file_symbol_may_be_aliased(s))) return false;
         OBJECT* object = object_of(s);
         if (!object) return false;
         for (SCALAR& scalar : *object) {
-            if (INT65(scalar.offset) != place.offset || INT65(static_cast<int64_t>(scalar.type->size)) != place.width)
+            if (INT65(scalar.offset) != INT65(place.constant) ||
+                INT65(static_cast<int64_t>(scalar.type->size)) != place.width)
                 continue;
             NODE* item = item_of(t->right, scalar.type);
             if (!item) return false;

@@ -36,12 +36,7 @@ namespace {
 constexpr int MOST_NODES = 48; // of an lvalue that facts are kept on
 
 bool have_same_base(const ADDRESS_FORM& a, const ADDRESS_FORM& b) {
-    if (a.object != b.object || a.terms.size() != b.terms.size()) return false;
-    return std::all_of(a.terms.begin(), a.terms.end(), [&b](const ADDRESS_TERM& x) {
-        return std::any_of(b.terms.begin(), b.terms.end(), [&x](const ADDRESS_TERM& y) {
-            return x.coefficient == y.coefficient && trees_are_congruent(x.tree, y.tree, false);
-        });
-    });
+    return a.object == b.object && a.has_same_terms(b);
 }
 
 } // namespace
@@ -67,16 +62,16 @@ bool compute_subrange(const NODE* lvalue, SUBRANGE* s) {
 
 bool covers(const SUBRANGE& later, const SUBRANGE& s) {
     const ADDRESS_FORM &l = later.place, &e = s.place;
-    if (e.offset < l.offset || e.offset + e.width > l.offset + l.width || !have_same_base(l, e)) return false;
-    if (l.object && l.terms.empty()) return true;
+    const INT65 from(e.constant), first(l.constant);
+    if (from < first || from + e.width > first + l.width || !have_same_base(l, e)) return false;
+    if (l.object && l.is_constant()) return true;
     TYPE *whole = later.lvalue->type, *part = s.lvalue->type;
     return equiv_mtypes(whole, part) || (whole->is_csu() && is_type_component_of_type(part, whole));
 }
 
 bool address_is_changed_by(const NODE* t, const SUBRANGE& s) {
-    const auto& terms = s.place.terms;
-    return std::any_of(terms.begin(), terms.end(),
-                       [t](const ADDRESS_TERM& x) { return tree_modifies_lvalue_in_tree(t, x.tree); });
+    return std::any_of(s.place.begin(), s.place.end(),
+                       [t](const LINEAR_FORM::TERM& x) { return tree_modifies_lvalue_in_tree(t, x.tree); });
 }
 
 namespace {

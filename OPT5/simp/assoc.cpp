@@ -6,6 +6,7 @@
 
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"
+#include "OPT5/simp/linear.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 
@@ -17,143 +18,166 @@ namespace {
 
 constexpr std::size_t MOST_OPERANDS = 32;
 
-struct OPERAND {
-    NODE* value;
-    INT65 factor; // of a sum's term
+// Builds a chain from operands in a new order. The number that the last operator gives is the one that the former chain
+// gave, if all before it is exact.
+class BUILDER {
+public:
+    BUILDER(TYPE* t, int operators, bool constants_are_exact, struct LOOP* l)
+        : type(t), operators_left(operators), is_exact(constants_are_exact), loop(l) {}
+
+    NODE* combined(int op, NODE* a, NODE* b) {
+        --operators_left;
+        // What a constant multiplies last, which is no 0, 1 or -1, is smaller than the product.
+        const bool is_smaller = op == MULT && operators_left == 1 && last_factor > INT65(1);
+        is_exact = is_exact && (operators_left == 0 || is_smaller || signed_result_is_exact(op, a, b, type, loop));
+        return is_exact ? made(op, a, b, type, loop) : made_exact(op, a, b, type, loop);
+    }
+
+    INT65 last_factor = 0; // its magnitude
+
+private:
+    TYPE* const type;
+    int operators_left;
+    bool is_exact;
+    struct LOOP* const loop;
 };
+
+// ---- Sums
+
+class SUM final : public LINEAR_READER {
+public:
+    explicit SUM(const NODE* root)
+        : LINEAR_READER(&sum, INT_MAX), sum(static_cast<unsigned>(root->type->size)), type(root->type->stqs()) {}
+
+    bool gains() const { return joined || constants > 1; }
+
+    // From positive terms to negative ones, the constant last.
+    NODE* build(struct LOOP* loop) const {
+        bool begins_negated = !sum.is_constant(); // one operator more, unless it is the factor
+        int operators = (constants ? 1 : 0) - 1;
+        for (const LINEAR_FORM::TERM& t : sum) {
+            operators += t.coefficient == 1 || t.coefficient == -1 ? 1 : 2;
+            begins_negated = begins_negated && t.coefficient < 0;
+        }
+        BUILDER builder(type, operators + (begins_negated ? 1 : 0), sum.is_exact, loop);
+        NODE* chain = nullptr;
+        for (bool negative : {false, true})
+            for (const LINEAR_FORM::TERM& t : sum) {
+                if ((t.coefficient < 0) != negative) continue;
+                const bool subtracts = negative && chain && fits_or_wraps(-INT65(t.coefficient), type);
+                const INT65 factor = subtracts ? -INT65(t.coefficient) : INT65(t.coefficient);
+                NODE* term = copy_tree(t.tree);
+                if (factor != INT65(1)) term = builder.combined(MULT, term, constant(factor));
+                chain = chain ? builder.combined(subtracts ? MINUS : PLUS, chain, term) : term;
+            }
+        if (!chain) return constant(INT65(sum.constant));
+        return constants ? builder.combined(PLUS, chain, constant(INT65(sum.constant))) : chain;
+    }
+
+private:
+    NODE* constant(INT65 v) const { return mk_ICON(truncate_to_type(v, type), type); }
+
+    bool opens(const NODE* t, const LINEAR_STEP&) override {
+        return t->op == UMINUS ? operand_has_type(t) : (t->op == PLUS || t->op == MINUS) && operands_have_type(t);
+    }
+    bool takes_constant(const NODE*) override {
+        ++constants;
+        return true;
+    }
+    bool leaf(const NODE* t, int64_t k) override {
+        LINEAR_STEP product;
+        if (is_node_with_icon(t, MULT) && linear_step(t, &product)) {
+            k = sum.reduced(static_cast<__int128>(k) * product.by_a);
+            t = product.a;
+        }
+        joined = joined || sum.find(t);
+        return sum.add(t, k);
+    }
+
+    LINEAR_FORM sum;
+    TYPE* const type;
+    int constants = 0;
+    bool joined = false;
+};
+
+// ---- Other chains
 
 class CHAIN {
 public:
-    explicit CHAIN(const NODE* root)
-        : op(root->op == MINUS ? static_cast<int>(PLUS) : root->op), type(root->type->stqs()) {}
+    explicit CHAIN(const NODE* root) : op(root->op), type(root->type->stqs()), constant(neutral()) {}
 
-    // Copies of the operands, equal ones joined. False where the chain is too long.
-    bool collect(const NODE* t, INT65 factor) {
-        if (op == PLUS && is_unary(t, UMINUS)) return collect(t->left, -factor);
-        const bool continues = op == PLUS ? t->op == PLUS || t->op == MINUS : t->op == op;
-        if (continues && operands_have_type(t))
-            return collect(t->left, factor) && collect(t->right, t->op == MINUS ? -factor : factor);
+    // Equal operands are joined. False where the chain is too long.
+    bool collect(const NODE* t) {
+        if (t->op == op && operands_have_type(t)) return collect(t->left) && collect(t->right);
         if (is_icon(t)) {
             ++constants;
-            join_constant(op == PLUS ? t->u.lval * factor : t->u.lval);
+            join_constant(t->u.lval);
             return true;
         }
-        if (op == PLUS && is_node_with_icon(t, MULT)) {
-            factor = factor * t->right->u.lval;
-            t = t->left;
-        }
-        return add(t, factor);
+        return add(t);
     }
 
     bool gains() const { return joined || constants > 1; }
 
-    // Sums are built from positive terms to negative ones, the constant last. What the last operator gives is the
-    // number that the chain gave, if all before it is exact.
-    NODE* build(struct LOOP* loop) {
-        bool begins_negated = true; // one operator more, unless it is the factor
-        for (const OPERAND& o : operands) {
-            if (!o.value) continue;
-            operators_left += 1 + (magnitude(o) != INT65(1));
-            begins_negated = begins_negated && is_negative(o);
-        }
-        operators_left += (constants ? 1 : 0) + (begins_negated ? 1 : 0) - 1;
+    NODE* build(struct LOOP* loop) const {
+        const int operators = static_cast<int>(operands.size()) + (constants ? 1 : 0) - 1;
+        BUILDER builder(type, operators, is_exact, loop);
+        if (constants && op == MULT) builder.last_factor = constant.is_negative() ? -constant : constant;
         NODE* chain = nullptr;
-        for (bool negative : {false, true})
-            for (OPERAND& o : operands)
-                if (o.value && is_negative(o) == negative) {
-                    chain = append(chain, o, loop);
-                    o.value = nullptr;
-                }
-        if (!chain) return mk_ICON(constants ? constant : neutral(), type);
-        return constants ? combined(op, chain, mk_ICON(constant, type), loop) : chain;
-    }
-
-    ~CHAIN() {
-        for (OPERAND& o : operands)
-            if (o.value) erase_tree(o.value);
+        for (const NODE* o : operands) chain = chain ? builder.combined(op, chain, copy_tree(o)) : copy_tree(o);
+        if (!chain) return mk_ICON(constant, type);
+        return constants ? builder.combined(op, chain, mk_ICON(constant, type)) : chain;
     }
 
 private:
-    INT65 signed_value(INT65 v) const { return truncate_to_type(v, tp->mk_signed(type)); }
-    INT65 neutral() const { return INT65(op == MULT ? 1 : op == ANDB ? -1 : 0); }
+    INT65 neutral() const { return truncate_to_type(INT65(op == MULT ? 1 : op == ANDB ? -1 : 0), type); }
 
     void join_constant(INT65 v) {
-        if (constants == 1)
-            constant = v;
-        else
-            constant = op == PLUS   ? constant + v
-                       : op == MULT ? constant * v
-                       : op == ANDB ? constant & v
-                       : op == ORB  ? constant | v
-                                    : constant ^ v;
-        constant = truncated(constant);
+        const INT65 r = op == MULT ? constant * v : op == ANDB ? constant & v : op == ORB ? constant | v : constant ^ v;
+        constant = truncate_to_type(r, type);
+        is_exact = is_exact && constant == r;
     }
 
-    bool add(const NODE* t, INT65 factor) {
-        for (OPERAND& o : operands) {
-            if (op == MULT || !o.value || !same_value(o.value, t)) continue;
-            joined = true;
-            o.factor = truncated(o.factor + factor);
-            const bool vanishes = op == XORB || (op == PLUS && o.factor.is_zero());
-            if (vanishes) {
-                erase_tree(o.value);
-                o.value = nullptr;
+    bool add(const NODE* t) {
+        if (op != MULT)
+            for (auto o = operands.begin(); o != operands.end(); ++o) {
+                if (!same_value(*o, t)) continue;
+                joined = true;
+                if (op == XORB) operands.erase(o);
+                return true;
             }
-            return true;
-        }
         if (operands.size() == MOST_OPERANDS) return false;
-        operands.push_back({copy_tree(t), truncated(factor)});
+        operands.push_back(t);
         return true;
-    }
-
-    INT65 truncated(INT65 v) {
-        const INT65 r = truncate_to_type(v, type);
-        is_exact = is_exact && r == v;
-        return r;
-    }
-
-    bool constant_is_unit() const { return constant >= INT65(-1) && constant <= INT65(1); }
-    bool is_negative(const OPERAND& o) const { return op == PLUS && signed_value(o.factor).is_negative(); }
-    // Of the factor that the term is multiplied by.
-    INT65 magnitude(const OPERAND& o) const {
-        const INT65 factor = op == PLUS ? signed_value(o.factor) : INT65(1);
-        return factor.is_negative() ? -factor : factor;
-    }
-
-    NODE* combined(int by, NODE* a, NODE* b, struct LOOP* loop) {
-        --operators_left;
-        const bool is_smaller =
-            op == MULT && operators_left == 1 && constants && !constant_is_unit(); // than the product
-        is_exact = is_exact && (operators_left == 0 || is_smaller || signed_result_is_exact(by, a, b, type, loop));
-        return is_exact ? made(by, a, b, type, loop) : made_exact(by, a, b, type, loop);
-    }
-
-    NODE* append(NODE* chain, const OPERAND& o, struct LOOP* loop) {
-        const bool negates = is_negative(o) && !chain;
-        NODE* term = o.value;
-        if (magnitude(o) != INT65(1) || negates)
-            term = combined(MULT, term, mk_ICON(negates ? -magnitude(o) : magnitude(o), type), loop);
-        if (!chain) return term;
-        return combined(is_negative(o) ? static_cast<int>(MINUS) : op, chain, term, loop);
     }
 
     const int op;
     TYPE* const type;
-    std::vector<OPERAND> operands;
+    std::vector<const NODE*> operands;
     INT65 constant;
-    int constants = 0, operators_left = 0;
-    bool joined = false, is_exact = true; // nothing is lost in the constants, and the operators so far are exact
+    int constants = 0;
+    bool joined = false, is_exact = true;
 };
 
-bool is_associative(int op) { return op == PLUS || op == MINUS || op == MULT || op == ANDB || op == ORB || op == XORB; }
+bool is_sum(int op) { return op == PLUS || op == MINUS; }
+bool is_associative(int op) { return is_sum(op) || op == MULT || op == ANDB || op == ORB || op == XORB; }
+
+// Null where nothing meets.
+NODE* rebuilt(const NODE* t, struct LOOP* loop) {
+    if (is_sum(t->op)) {
+        SUM sum(t);
+        return sum.read(t, 1) && sum.gains() ? sum.build(loop) : nullptr;
+    }
+    CHAIN chain(t);
+    return chain.collect(t) && chain.gains() ? chain.build(loop) : nullptr;
+}
 
 } // namespace
 
 NODE* simp_assoc(NODE* t, struct LOOP* loop) {
     if (!is_associative(t->op) || !is_integer(t->type) || !operands_have_type(t) || !is_pure(t)) return t;
-    CHAIN chain(t);
-    if (!chain.collect(t, INT65(1)) || !chain.gains()) return t;
-    NODE* r = chain.build(loop);
+    NODE* r = rebuilt(t, loop);
+    if (!r) return t;
     if (!r->ls) r->ls = t->ls;
     erase_tree(t);
     return r;

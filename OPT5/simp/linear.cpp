@@ -1,181 +1,135 @@
 #include "OPT5/simp/linear.h"
 
 #include "OPT5/ir/trees.h"
-#include "OPT5/ir/walks.h"
-#include "OPT5/simp/factor.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/range.h"
+
+#include <algorithm>
 
 namespace {
 
-constexpr int MOST_PURE_NODES = 48;
+constexpr int64_t ADDRESS_UNIT = 16; // bits
 
-bool is_number(const TYPE* t) { return has_value_range(t) || t->is_pointer(); }
-bool is_plain_integer(const TYPE* t) { return has_value_range(t) && !t->is_bool() && !t->is_enum(); }
+int64_t low_bits(INT65 v) { return static_cast<int64_t>(v.value); }
 
+// Both extend to more bits in the same manner.
 bool extends_alike(const TYPE* a, const TYPE* b) {
-    if (a->size != b->size) return false;
-    return has_value_range(a) && has_value_range(b)
-               ? wraps_signed(a) == wraps_signed(b) && a->is_bool() == b->is_bool() && a->is_enum() == b->is_enum()
-               : a->is_pointer() && b->is_pointer();
+    if (a->size != b->size || has_value_range(a) != has_value_range(b)) return false;
+    return !has_value_range(a) ||
+           (wraps_signed(a) == wraps_signed(b) && a->is_bool() == b->is_bool() && a->is_enum() == b->is_enum());
 }
 
 } // namespace
 
-bool is_pure_within(const NODE* t, int* nodes_left) {
-    for (; t; t = t->left) {
-        if (--*nodes_left < 0 || op_has_effect(t->op) || op_is_intrinsic(t->op)) return false;
-        if ((t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF) && lvalue_is_volatile(t))
-            return false;
-        if (!is_pure_within(t->right, nodes_left)) return false;
-    }
-    return true;
-}
-
-bool is_small_and_pure(const NODE* t) {
-    int nodes_left = MOST_PURE_NODES;
-    return is_pure_within(t, &nodes_left);
-}
-
-bool LINEAR::takes(const NODE* tree) {
-    return is_number(tree->type) && !tree->type->is_enum() && is_small_and_pure(tree);
-}
-
-LINEAR::LINEAR(const NODE* tree, struct LOOP* in) : loop(in) {
-    if (!takes(tree)) return;
-    complete = true;
-    bits = static_cast<unsigned>(tree->type->size);
-    add(tree, 1);
-}
-
-void LINEAR::subtract(const NODE* tree) {
-    complete = complete && takes(tree) && tree->type->size == bits;
-    if (!complete) return;
-    nodes_left = MOST_NODES;
-    add(tree, ~uint64_t(0));
-}
-
-void LINEAR::add_term(const NODE* t, uint64_t coef) {
-    for (int i = 0; i < count; ++i)
-        if (extends_alike(terms[i].tree->type, t->type) && is_same_value(terms[i].tree, t)) {
-            terms[i].coef += coef;
-            if ((terms[i].coef & mask()) == 0) terms[i] = terms[--count];
-            return;
-        }
-    if (count == MOST_TERMS)
-        complete = false;
-    else if (coef & mask())
-        terms[count++] = {t, coef};
-}
-
-// Below the width of the sum an operator wraps where the sum does not.
-bool LINEAR::keeps_sum(const NODE* t) const {
-    return t->type->size >= bits || (is_plain_integer(t->type) && operation_is_exact(t, loop));
-}
-
-bool LINEAR::add_operator(const NODE* t, uint64_t coef) {
-    auto fits = [t](const NODE* n) {
-        if (t->type->is_pointer()) return is_number(n->type) && !n->type->is_enum();
-        return n->type->is_pointer() ? t->type->size == n->type->size
-                                     : is_plain_integer(n->type) && extends_alike(n->type, t->type);
-    };
+bool linear_step(const NODE* t, LINEAR_STEP* step) {
+    *step = {t->left, nullptr, 1, 0, 0};
     switch (t->op) {
     case PLUS:
     case MINUS:
-        if (!fits(t->left) || !fits(t->right) || !keeps_sum(t)) return false;
-        add(t->left, coef);
-        add(t->right, t->op == PLUS ? coef : -coef);
+        step->b = t->right;
+        step->by_b = t->op == PLUS ? 1 : -1;
         return true;
-    case UMINUS:
-        if (!fits(t->left) || !keeps_sum(t)) return false;
-        add(t->left, -coef);
-        return true;
+    case UMINUS: step->by_a = -1; return true;
     case NOTB: // -1 - x
-        if (!fits(t->left) || t->type->size < bits) return false;
-        constant -= coef;
-        add(t->left, -coef);
+        step->by_a = step->constant = -1;
         return true;
     case MULT: {
-        const NODE *x = t->left, *c = t->right;
-        if (x->op == ICON) std::swap(x, c);
-        if (c->op != ICON || !fits(x) || !fits(c) || !keeps_sum(t)) return false;
-        add(x, coef * c->u.lval.value);
-        return true;
+        const NODE* c = t->right;
+        if (t->left->op == ICON) std::swap(step->a, c);
+        step->by_a = low_bits(c->u.lval);
+        return c->op == ICON;
     }
-    case SLL: {
-        const NODE* n = t->right;
-        if (n->op != ICON || n->u.lval.is_negative() || n->u.lval >= INT65(t->type->size) || !fits(t->left))
+    case SLL:
+        if (t->right->op != ICON || t->right->u.lval.is_negative() || t->right->u.lval >= INT65(t->type->size))
             return false;
-        if (!keeps_sum(t)) return false;
-        add(t->left, coef << n->u.lval.value);
+        step->by_a = static_cast<int64_t>(uint64_t(1) << t->right->u.lval.value);
         return true;
-    }
-    case PMCONV:
-        if (t->right->op != ICON || !fits(t->left) || t->type->size < bits) return false;
-        add(t->left, coef * (t->right->u.lval / INT65(16)).value);
-        return true;
+    case PMCONV: // by a size in bits
+        step->by_a = low_bits(t->right->u.lval) / ADDRESS_UNIT;
+        return t->right->op == ICON;
+    case SCONV:
+    case PCONV:
+    case ISP2CHAR: return true;
     default: return false;
     }
 }
 
-// A cast's value is its operand's modulo the width of its type.
-bool LINEAR::add_cast(const NODE* t, uint64_t coef) {
-    const TYPE *to = t->type, *from = t->left->type;
-    if (!is_number(from) || from->is_enum() || to->is_bool() || to->is_enum()) return false;
-    const bool is_exact =
-        has_value_range(to) && has_value_range(from) && range_of_tree(t->left, loop).is_within(range_of_type(to));
-    if (to->size < bits && !is_exact) return false;
-    add(t->left, coef);
+// ---- The record
+
+LINEAR_FORM& LINEAR_FORM::operator=(const LINEAR_FORM& o) {
+    bits = o.bits;
+    is_exact = o.is_exact;
+    constant = o.constant;
+    count = o.count;
+    std::copy(o.begin(), o.end(), terms);
+    return *this;
+}
+
+int64_t LINEAR_FORM::reduced(__int128 v) {
+    const unsigned unused = 64 - bits;
+    const int64_t r = static_cast<int64_t>(static_cast<uint64_t>(v) << unused) >> unused;
+    is_exact = is_exact && r == v;
+    return r;
+}
+
+void LINEAR_FORM::add_constant(int64_t v) { constant = reduced(static_cast<__int128>(constant) + v); }
+
+const LINEAR_FORM::TERM* LINEAR_FORM::find(const NODE* tree) const {
+    const TERM* t = std::find_if(begin(), end(), [tree](const TERM& x) {
+        return extends_alike(x.tree->type, tree->type) && is_same_value(x.tree, tree);
+    });
+    return t == end() ? nullptr : t;
+}
+
+bool LINEAR_FORM::has_same_terms(const LINEAR_FORM& other) const {
+    return count == other.count && std::all_of(begin(), end(), [&other](const TERM& t) {
+               const TERM* met = other.find(t.tree);
+               return met && met->coefficient == t.coefficient;
+           });
+}
+
+void LINEAR_FORM::erase(const TERM* term) {
+    std::copy(term + 1, end(), terms + (term - terms));
+    --count;
+}
+
+bool LINEAR_FORM::add(const NODE* tree, int64_t coefficient) {
+    coefficient = reduced(coefficient);
+    if (const TERM* met = find(tree)) {
+        TERM& t = terms[met - terms];
+        t.coefficient = reduced(static_cast<__int128>(t.coefficient) + coefficient);
+        if (t.coefficient == 0) erase(met);
+        return true;
+    }
+    if (coefficient == 0) return true;
+    if (count == MOST_TERMS) return false;
+    terms[count++] = {tree, coefficient};
     return true;
 }
 
-void LINEAR::add(const NODE* t, uint64_t coef) {
-    t = without_wrappers(t);
-    if (!complete) return;
-    if (t->op == ICON && has_value_range(t->type)) {
-        constant += coef * to_int65(range_of_tree(t, nullptr).min).value;
-        return;
+// ---- The walk
+
+bool LINEAR_READER::takes_constant(const NODE* icon) { return has_value_range(icon->type); }
+
+bool LINEAR_READER::read(const NODE* t, int64_t k) {
+    auto times = [&](int64_t by) { return form.reduced(static_cast<__int128>(k) * by); };
+    for (;;) {
+        t = without_marks(t);
+        LINEAR_STEP step;
+        if (t->op == ICON && takes_constant(t)) {
+            const INT65 v = t->type->is_bool() ? INT65(t->u.lval.is_zero() ? 0 : 1) : t->u.lval;
+            form.add_constant(times(low_bits(v)));
+            return true;
+        }
+        if (--nodes_left < 0 || !linear_step(t, &step) || !opens(t, step)) return leaf(t, k);
+        if (step.constant) form.add_constant(times(step.constant));
+        if (step.b) {
+            if (!read(step.a, times(step.by_a))) return false;
+            t = step.b;
+            k = times(step.by_b);
+        } else {
+            t = step.a;
+            k = times(step.by_a);
+        }
     }
-    const bool is_done =
-        --nodes_left >= 0 && (t->op == SCONV || t->op == PCONV ? add_cast(t, coef) : add_operator(t, coef));
-    if (!is_done) add_term(t, coef);
-}
-
-bool LINEAR::is_constant() const { return complete && count == 0; }
-bool LINEAR::constant_is(INT65 v) const { return ((constant - v.value) & mask()) == 0; }
-
-WIDE LINEAR::centered(uint64_t v) const {
-    v &= mask();
-    const WIDE turn = WIDE(1) << bits;
-    return v >> (bits - 1) ? static_cast<WIDE>(v) - turn : static_cast<WIDE>(v);
-}
-
-bool LINEAR::sum_range(RANGE* r) const {
-    if (!complete) return false;
-    *r = {constant_part(), constant_part()};
-    constexpr WIDE limit = WIDE(1) << 100;
-    for (int i = 0; i < count; ++i) {
-        if (!has_value_range(terms[i].tree->type)) return false;
-        const RANGE t = range_of_tree(terms[i].tree, loop);
-        const WIDE c = coefficient(i);
-        WIDE a, b;
-        if (__builtin_mul_overflow(c, t.min, &a) || __builtin_mul_overflow(c, t.max, &b)) return false;
-        if (std::min(a, b) < -limit || std::max(a, b) > limit) return false; // their sums stay exact
-        r->min += std::min(a, b);
-        r->max += std::max(a, b);
-    }
-    return true;
-}
-
-bool LINEAR::cannot_be_zero(struct LOOP* in) const {
-    if (!complete) return false;
-    if (count == 0) return (constant & mask()) != 0;
-    const WIDE turn = WIDE(1) << bits;
-    RANGE r;
-    if (sum_range(&r) && !r.holds(0) && r.min > -turn && r.max < turn) return true;
-    // The low bits that no term reaches.
-    unsigned low = bits;
-    for (int i = 0; i < count; ++i) {
-        const unsigned zeros = trailing_zeros(terms[i].coef) + trailing_zeros_of_tree(terms[i].tree, in);
-        low = std::min(low, zeros);
-    }
-    return low > 0 && (constant & mask() & (low >= 64 ? ~uint64_t(0) : (uint64_t(1) << low) - 1)) != 0;
 }

@@ -1,48 +1,79 @@
-// An integer or pointer tree as a sum of terms with constant coefficients, in arithmetic that wraps at the tree's
-// width. Equal terms are joined, so that what two trees have in common cancels in their difference. For this room.
+// Integers and addresses as sums of multiples: constant + coefficient * tree + ...
+//
+// One record, one list of operators that are such sums, and one walk that takes a tree apart. Who asks says which
+// operators may be opened, and what a term is.
 #pragma once
 
-#include "OPT5/simp/range.h"
-
+#include <climits>
 #include <cstdint>
 
-class LINEAR {
-public:
-    static constexpr int MOST_TERMS = 8, MOST_NODES = 32;
+class NODE;
+
+// An operator as a sum of multiples of its operands, in arithmetic that wraps at its width.
+struct LINEAR_STEP {
+    const NODE *a, *b; // b is null where only one operand varies
+    int64_t by_a, by_b, constant;
+};
+// PLUS, MINUS, UMINUS, NOTB, MULT by a constant on either side, SLL by one, PMCONV, and casts of numbers and pointers,
+// whatever the types. False for any other operator.
+bool linear_step(const NODE* t, LINEAR_STEP* step);
+
+// The value of the sum modulo 2^`bits`. Trees are borrowed; each has the value of its own type.
+struct LINEAR_FORM {
+    static constexpr int MOST_TERMS = 32;
     struct TERM {
-        const NODE* tree; // borrowed; its value extends by the sign of its own type
-        uint64_t coef;    // modulo 2^64
+        const NODE* tree;
+        int64_t coefficient;
     };
 
-    // Whether the tree can be taken apart: of at most 64 bits, without effects, of moderate size.
-    static bool takes(const NODE* tree);
-    LINEAR(const NODE* tree, struct LOOP* in); // of a tree that it does not take, nothing is known
-    void subtract(const NODE* tree);           // of the same width
+    explicit LINEAR_FORM(unsigned modulus_bits) : bits(modulus_bits) {}
+    LINEAR_FORM(const LINEAR_FORM& o) { *this = o; }
+    LINEAR_FORM& operator=(const LINEAR_FORM& o);
 
-    bool is_known() const { return complete; }
-    bool is_constant() const;
-    bool constant_is(INT65 v) const; // the constant part, modulo the width
-    bool cannot_be_zero(struct LOOP* in) const;
+    unsigned bits;
+    // The sum is the value as a number too: nothing was reduced, and no operator that may wrap was opened.
+    bool is_exact = true;
+    int64_t constant = 0; // this and the coefficients: the numbers nearest to zero
+
+    // No two terms of one value, none with the coefficient 0; in the order in which they were met.
+    const TERM* begin() const { return terms; }
+    const TERM* end() const { return terms + count; }
     int term_count() const { return count; }
-    const TERM& term(int i) const { return terms[i]; }
-    WIDE coefficient(int i) const { return centered(terms[i].coef); } // the one nearest to zero
-    WIDE constant_part() const { return centered(constant); }
-    // Bounds of the sum in exact arithmetic; false where they are too wide to tell.
-    bool sum_range(RANGE* r) const;
+    bool is_constant() const { return count == 0; }
+    bool add(const NODE* tree, int64_t coefficient); // false if there is no room
+    void add_constant(int64_t v);
+    void erase(const TERM* term);
+    template <class KEEPS>
+    void keep_if(KEEPS&& keeps) {
+        for (int i = 0; i < count;)
+            if (keeps(terms[i]))
+                ++i;
+            else
+                erase(&terms[i]);
+    }
+    const TERM* find(const NODE* tree) const; // the term of this value, or null
+    bool has_same_terms(const LINEAR_FORM& other) const;
+    int64_t reduced(__int128 v);
 
 private:
-    void add(const NODE* t, uint64_t coef);
-    void add_term(const NODE* t, uint64_t coef);
-    bool add_operator(const NODE* t, uint64_t coef);
-    bool add_cast(const NODE* t, uint64_t coef);
-    bool keeps_sum(const NODE* t) const; // taking the operator apart does not change the value modulo the width
-    uint64_t mask() const { return bits >= 64 ? ~uint64_t(0) : (uint64_t(1) << bits) - 1; }
-    WIDE centered(uint64_t v) const;
-
-    struct LOOP* loop;
-    unsigned bits = 0;
     TERM terms[MOST_TERMS];
-    int count = 0, nodes_left = MOST_NODES;
-    uint64_t constant = 0;
-    bool complete = false;
+    int count = 0;
+};
+
+// Adds a multiple of a tree to a form.
+class LINEAR_READER {
+public:
+    virtual ~LINEAR_READER() = default;
+    bool read(const NODE* t, int64_t coefficient); // false, with a part of it added, if a part was refused
+
+protected:
+    LINEAR_READER(LINEAR_FORM* f, int most_nodes) : form(*f), nodes_left(most_nodes) {}
+    // Whether the step's sum may stand for the operator. It clears `is_exact` of the form where the operator may wrap.
+    virtual bool opens(const NODE* t, const LINEAR_STEP& step) = 0;
+    virtual bool takes_constant(const NODE* icon); // other ICONs are leaves
+    virtual const NODE* without_marks(const NODE* t) const { return t; }
+    virtual bool leaf(const NODE* t, int64_t coefficient) { return form.add(t, coefficient); } // false: refused
+
+    LINEAR_FORM& form;
+    int nodes_left;
 };

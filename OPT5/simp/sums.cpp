@@ -7,6 +7,7 @@
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/linear.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -179,8 +180,9 @@ struct TERM {
 };
 
 TERM term_of(NODE* t) {
-    if (is_node_with_icon(t, MULT)) return {t->left, t->right->u.lval};
-    if (t->op == SLL && shift_count_of(t)) return {t->left, INT65(1) << INT65(shift_count_of(t))};
+    LINEAR_STEP step;
+    const bool multiplies = is_node_with_icon(t, MULT) || shift_count_of(t);
+    if (multiplies && linear_step(t, &step)) return {t->left, INT65(step.by_a)};
     return {t, INT65(1)};
 }
 

@@ -5,7 +5,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/known_bits.h"
-#include "OPT5/simp/linear.h"
+#include "OPT5/simp/linear_value.h"
 #include "OPT5/simp/range.h"
 #include "OPT5/target/bif.h"
 
@@ -83,7 +83,7 @@ int sign_of_integer_expression(const NODE* tree, struct LOOP* loop, bool non_neg
 bool tree_is_ivalue(const NODE* tree, INT65 value, struct LOOP* loop) {
     if (!has_value_range(tree->type)) return false;
     if (range_of_tree(tree, loop).is(to_wide(value))) return true;
-    const LINEAR form(tree, loop);
+    const LINEAR_VALUE form(tree, loop);
     return form.is_constant() && range_of_type(tree->type).holds(to_wide(value)) && form.constant_is(value);
 }
 
@@ -98,8 +98,8 @@ bool tree_is_not_ivalue(const NODE* tree, INT65 value, struct LOOP* loop) {
 
 bool tree_difference_is_ivalue(const NODE* a, const NODE* b, INT65 value, struct LOOP* loop) {
     if (value.is_zero() && a->type->size == b->type->size && is_same_value(a, b)) return true;
-    if (!LINEAR::takes(a) || !LINEAR::takes(b) || a->type->size != b->type->size) return false;
-    LINEAR difference(a, loop);
+    if (!LINEAR_VALUE::takes(a) || !LINEAR_VALUE::takes(b) || a->type->size != b->type->size) return false;
+    LINEAR_VALUE difference(a, loop);
     difference.subtract(b);
     return difference.is_constant() && difference.constant_is(value);
 }
@@ -112,10 +112,10 @@ bool tree_values_are_not_equal(const NODE* a, const NODE* b, struct LOOP* loop) 
         const KNOWN_BITS p = known_bits(a), q = known_bits(b);
         if (one_form && ((p.ones & q.zeros) || (p.zeros & q.ones))) return true;
     }
-    if (!LINEAR::takes(a) || !LINEAR::takes(b) || a->type->size != b->type->size) return false;
-    LINEAR difference(a, loop);
+    if (!LINEAR_VALUE::takes(a) || !LINEAR_VALUE::takes(b) || a->type->size != b->type->size) return false;
+    LINEAR_VALUE difference(a, loop);
     difference.subtract(b);
-    return difference.cannot_be_zero(loop);
+    return difference.cannot_be_zero();
 }
 
 // ---- Overflow

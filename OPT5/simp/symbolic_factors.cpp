@@ -7,7 +7,7 @@
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/factor.h"
 #include "OPT5/simp/known_bits.h"
-#include "OPT5/simp/linear.h"
+#include "OPT5/simp/linear_value.h"
 #include "OPT5/simp/range.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -185,13 +185,11 @@ private:
 
 // From the terms of the tree as a sum.
 FACTOR factor_of_terms(const NODE* t, struct LOOP* loop) {
-    const LINEAR form(t, loop);
+    const LINEAR_VALUE form(t, loop);
     if (!form.is_known()) return 1;
-    FACTOR f = magnitude(form.constant_part());
-    for (int i = 0; i < form.term_count() && f != 1; ++i) {
-        const WIDE coef = form.coefficient(i);
-        f = gcd(f, product(magnitude(coef), FACTORS(loop, false).of(form.term(i).tree)));
-    }
+    FACTOR f = magnitude(WIDE(form.sum().constant));
+    for (const LINEAR_FORM::TERM& term : form.sum())
+        if (f != 1) f = gcd(f, product(magnitude(WIDE(term.coefficient)), FACTORS(loop, false).of(term.tree)));
     RANGE sum;
     if (form.sum_range(&sum) && sum.is_within(range_of_type(t->type))) return f;
     return after_wrap(f, static_cast<unsigned>(t->type->size));
@@ -261,15 +259,14 @@ bool integer_DIV_is_exact(const NODE* tree, struct LOOP* loop) {
 
 INT65 max_ICON_delta(const NODE* tree, struct LOOP* loop) {
     if (!has_value_range(tree->type)) return 1;
-    const LINEAR form(tree, loop);
+    const LINEAR_VALUE form(tree, loop);
     if (!form.is_known()) return 1;
     FACTOR f = 0;
     bool varies = false;
-    for (int i = 0; i < form.term_count(); ++i) {
-        const NODE* term = form.term(i).tree;
-        if (loop && loop_seams.is_constant_in && loop_seams.is_constant_in(term, loop)) continue;
+    for (const LINEAR_FORM::TERM& term : form.sum()) {
+        if (loop && loop_seams.is_constant_in && loop_seams.is_constant_in(term.tree, loop)) continue;
         varies = true;
-        f = gcd(f, product(magnitude(form.coefficient(i)), FACTORS(loop, false).of(term)));
+        f = gcd(f, product(magnitude(WIDE(term.coefficient)), FACTORS(loop, false).of(term.tree)));
     }
     RANGE sum;
     const bool is_exact = form.sum_range(&sum) && sum.is_within(range_of_type(tree->type));
@@ -310,16 +307,16 @@ INT65 expr_modulo_constant(const NODE* tree, TYPE* type, INT65 value, struct LOO
         if (keeps_value || survives_wraps) found = residue(to_wide(fact->right->u.lval));
     });
     if (found >= INT65(0)) return found;
-    const LINEAR form(tree, loop);
+    const LINEAR_VALUE form(tree, loop);
     if (!form.is_known()) return -1;
     RANGE sum;
     const bool is_exact = keeps_value && form.sum_range(&sum) && sum.is_within(range_of_type(tree->type));
     if (!is_exact && !survives_wraps) return -1;
-    for (int i = 0; i < form.term_count(); ++i) {
-        const FACTOR f = product(magnitude(form.coefficient(i)), FACTORS(loop, false).of(form.term(i).tree));
+    for (const LINEAR_FORM::TERM& term : form.sum()) {
+        const FACTOR f = product(magnitude(WIDE(term.coefficient)), FACTORS(loop, false).of(term.tree));
         if (f % static_cast<FACTOR>(m) != 0) return -1;
     }
-    return residue(form.constant_part());
+    return residue(form.sum().constant);
 }
 
 bool expr_cannot_divide_expr(const NODE* a, const NODE* b, struct LOOP* loop) {
@@ -389,29 +386,37 @@ bool is_modular_cast(const NODE* t) {
     return t->op == SCONV && is_number_type(t->type) && is_number_type(t->left->type) &&
            t->left->type->size >= t->type->size;
 }
-bool is_small_shift(const NODE* t) {
-    return t->op == SLL && t->right->op == ICON && !t->right->u.lval.is_negative() &&
-           t->right->u.lval < INT65(t->type->size) && t->left->type->size == t->type->size;
+
+// Whether the operator's parts are divided where it is.
+bool has_coef(const NODE* t) {
+    switch (t->op) {
+    case MULT:
+        if (t->right->op != ICON || t->right->u.lval > INT65(INT64_MAX)) return false;
+        break;
+    case PLUS:
+    case MINUS:
+    case UMINUS:
+    case SLL: break;
+    default: return is_modular_cast(t);
+    }
+    auto fits = [t](const NODE* n) { return n->type->size == t->type->size; };
+    return fits(t->left) && ((t->op != PLUS && t->op != MINUS) || fits(t->right));
 }
-bool is_scaling(const NODE* t) { return t->op == MULT && t->right->op == ICON && t->left->type->size == t->type->size; }
 
 FACTOR coef_of(const NODE* t, int levels) {
     if (!is_number_type(t->type)) return 1;
     if (t->op == ICON) return magnitude(t->u.lval);
-    if (levels == 0) return 1;
-    switch (t->op) {
-    case PLUS:
-    case MINUS:
-        if (t->left->type->size != t->type->size || t->right->type->size != t->type->size) return 1;
-        return gcd(coef_of(t->left, levels - 1), coef_of(t->right, levels - 1));
-    case UMINUS: return t->left->type->size == t->type->size ? coef_of(t->left, levels - 1) : 1;
-    }
-    if (is_scaling(t)) return product(coef_of(t->left, levels - 1), magnitude(t->right->u.lval));
-    if (is_small_shift(t)) return product(coef_of(t->left, levels - 1), FACTOR(1) << t->right->u.lval.value);
-    return is_modular_cast(t) ? coef_of(t->left, levels - 1) : 1;
+    LINEAR_STEP step;
+    if (levels == 0 || !linear_step(t, &step) || !has_coef(t)) return 1;
+    const FACTOR f = product(coef_of(step.a, levels - 1), magnitude(WIDE(step.by_a)));
+    return step.b ? gcd(f, product(coef_of(step.b, levels - 1), magnitude(WIDE(step.by_b)))) : f;
 }
 
-NODE* divide_coef(NODE* t, FACTOR c, int levels) {
+// A sum that is exact is so once it is divided; not if a part wraps in a shift or a cast: divided, that is another
+// number.
+NODE* divided(NODE* t, bool is_exact) { return is_exact ? simp_node(t, nullptr) : kept_exact(t, nullptr); }
+
+NODE* divide_coef(NODE* t, FACTOR c, bool is_exact) {
     if (c == 1) return t;
     if (t->op == ICON) {
         t->u.lval = truncate_to_type(t->u.lval / INT65(0, c), t->type);
@@ -420,24 +425,24 @@ NODE* divide_coef(NODE* t, FACTOR c, int levels) {
     switch (t->op) {
     case PLUS:
     case MINUS:
-        t->left = divide_coef(t->left, c, levels - 1);
-        t->right = divide_coef(t->right, c, levels - 1);
-        return simp_node(t, nullptr);
-    case UMINUS: t->left = divide_coef(t->left, c, levels - 1); return simp_node(t, nullptr);
+        t->left = divide_coef(t->left, c, is_exact);
+        t->right = divide_coef(t->right, c, is_exact);
+        return divided(t, is_exact);
+    case UMINUS: t->left = divide_coef(t->left, c, is_exact); return divided(t, is_exact);
     case SLL: { // as a product, whose constant is divided next
         t->op = MULT;
         const INT65 power = INT65(1) << t->right->u.lval;
         erase_tree(t->right);
         t->right = mk_ICON(power, t->type->stqs());
-        return divide_coef(t, c, levels);
+        return divide_coef(t, c, is_exact);
     }
     case MULT: {
         const FACTOR here = gcd(c, magnitude(t->right->u.lval));
         t->right->u.lval = truncate_to_type(t->right->u.lval / INT65(0, here), t->right->type);
-        t->left = divide_coef(t->left, c / here, levels - 1);
-        return simp_node(t, nullptr);
+        t->left = divide_coef(t->left, c / here, is_exact);
+        return divided(t, is_exact);
     }
-    case SCONV: t->left = divide_coef(t->left, c, levels - 1); return simp_node(t, nullptr);
+    case SCONV: t->left = divide_coef(t->left, c, is_exact); return simp_node(t, nullptr);
     }
     OPT_ASSERT(false);
     return t;
@@ -450,6 +455,7 @@ INT65 max_ICON_coef(const NODE* tree) { return INT65(0, coef_of(tree, MOST_COEF_
 NODE* div_ICON_coef(NODE* tree, INT65 value) {
     const FACTOR c = magnitude(value);
     OPT_ASSERT(c != 0 && coef_of(tree, MOST_COEF_LEVELS) % c == 0);
-    NODE* t = divide_coef(tree, c, MOST_COEF_LEVELS);
-    return value.is_negative() ? simp_node(maketree(UMINUS, t, nullptr, t->type->stqs()), nullptr) : t;
+    const bool wraps = tree_contains_matching_node(tree, [](const NODE* n) { return n->op == SLL || n->op == SCONV; });
+    NODE* t = divide_coef(tree, c, !wraps);
+    return value.is_negative() ? divided(maketree(UMINUS, t, nullptr, t->type->stqs()), !wraps && c > 1) : t;
 }

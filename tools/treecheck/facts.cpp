@@ -153,7 +153,7 @@ private:
         expect(question, [&](const RUN& r) {
             trial.begin(&e, r.assignment);
             const BITS v = e.eval(result);
-            return holds(r, v, e.undefined);
+            return holds(r, v, e.undefined || (e.overflowed && !r.overflowed));
         });
         if (was_right && !wrong.empty()) wrong += ", answer " + tree_to_infix(result);
         erase_tree(result);

@@ -13,7 +13,7 @@ protected:
     std::mt19937 random{20240607};
     int pick(int n) { return static_cast<int>(random() % static_cast<unsigned>(n)); }
 
-    SYMTAB *a, *w, *s, *x, *i, *j, *u, *p, *q, *r, *d, *t;
+    SYMTAB *a, *w, *s, *x, *i, *j, *u, *k, *p, *q, *r, *d, *t;
     std::unordered_map<const SYMTAB*, long> place; // of objects, in units
     std::unordered_map<const SYMTAB*, long> value; // of variables
     int unknowns = 0;
@@ -26,6 +26,7 @@ protected:
         i = local("i");
         j = local("j");
         u = local("u", tp->uint_t);
+        k = local("k", tp->ulong_t);
         TYPE* pointer = ptr(tp->int_t);
         p = parameter("p", pointer);
         q = parameter("q", pointer);
@@ -47,6 +48,8 @@ protected:
     void give_values() {
         for (SYMTAB* v : {i, j}) value[v] = pick(13) - 4;
         value[u] = pick(4) ? pick(8) : 65535 - pick(3);
+        value[k] =
+            static_cast<long>(pick(2) ? uint32_t(pick(12)) : uint32_t(pick(40)) * 0xAAAAAAABu); // a third, wrapped
         value[p] = 5000 + pick(6);
         value[q] = 5000 + pick(6);
         value[r] = place[a] + 6;
@@ -55,7 +58,7 @@ protected:
     }
 
     NODE* index(int depth) {
-        switch (depth ? pick(8) : pick(3)) {
+        switch (depth ? pick(10) : pick(3)) {
         case 0: return icon(pick(9) - 2);
         case 1: return name(i);
         case 2: return name(j);
@@ -65,7 +68,13 @@ protected:
             NODE* wrapped = maketree(PLUS, name(u), mk_ICON(INT65(pick(4)), tp->uint_t), tp->uint_t);
             return maketree(SCONV, wrapped, nullptr, tp->long_t);
         }
-        case 6: return maketree(SCONV, maketree(PLUS, name(i), icon(pick(3)), tp->int_t), nullptr, tp->long_t);
+        case 6: // wraps where an address does
+        case 7: {
+            TYPE* type = tp->ulong_t;
+            NODE* product = maketree(MULT, name(k), mk_ICON(INT65(1 + pick(3)), type), type);
+            return maketree(SCONV, maketree(PLUS, product, mk_ICON(INT65(pick(4)), type), type), nullptr, tp->long_t);
+        }
+        case 8: return maketree(SCONV, maketree(PLUS, name(i), icon(pick(3)), tp->int_t), nullptr, tp->long_t);
         default: return maketree(PLUS, index(depth - 1), index(depth - 1), tp->int_t);
         }
     }
@@ -85,7 +94,7 @@ protected:
     NODE* pointer(TYPE* pointee) {
         SYMTAB* const bases[] = {p, q, r, d, t};
         SYMTAB* const arrays[] = {a, w, s};
-        NODE* base = pick(2) ? name(bases[pick(5)]) : start_of(arrays[pick(3)]);
+        NODE* base = pick(2) ? name(bases[pick(2) ? 0 : pick(5)]) : start_of(arrays[pick(3)]);
         NODE* sum = maketree(pick(5) ? PLUS : MINUS, base, uniform(index(2)), base->type);
         return maketree(PCONV, sum, nullptr, ptr(pointee));
     }
@@ -99,6 +108,10 @@ protected:
         }
     }
 
+    static long held(const TYPE* type, long v) {
+        if (type == tp->uint_t) return v & 0xFFFF;
+        return type == tp->long_t ? static_cast<int32_t>(v) : type == tp->ulong_t ? static_cast<uint32_t>(v) : v;
+    }
     long eval(const NODE* n) {
         switch (n->op) {
         case ICON: return static_cast<long>(n->u.lval.fits_in<int64_t>());
@@ -106,11 +119,11 @@ protected:
         case PLUS:
         case MINUS: {
             const long v = n->op == PLUS ? eval(n->left) + eval(n->right) : eval(n->left) - eval(n->right);
-            return n->type == tp->uint_t ? v & 0xFFFF : v;
+            return held(n->type, v);
         }
-        case MULT: return eval(n->left) * eval(n->right);
+        case MULT: return held(n->type, eval(n->left) * eval(n->right));
         case SCONV:
-        case PCONV: return eval(n->left);
+        case PCONV: return held(n->type, eval(n->left));
         case UAND: return start(n->left);
         default: ADD_FAILURE() << opname(n->op); return 0;
         }

@@ -11,8 +11,8 @@ class I_SYMTAB;
 
 class BASE_NODE {
 public:
-    int op = 0;           // opcode, which is the number of the I-file's record as well
     TYPE* type = nullptr; // type of the value
+    int op = 0;           // opcode, which is the number of the I-file's record as well
 
     // ---- What the writer asks. A value that does not fit the result is an assertion failure.
     virtual I_SYMTAB* name_symbol() const = 0;

@@ -163,7 +163,7 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     if (object_b && is_out_of_reach(object_b, a, x)) return false;
     if (accesses_are_disjoint(x, y, loop)) return false;
     if (are_kept_apart(a, b, loop != nullptr) || are_told_apart_by_records(a, b)) return false;
-    if (UMULT_PT_targets_may_overlap && a->ptenv && b->ptenv && !UMULT_PT_targets_may_overlap(a, b)) return false;
+    if (UMULT_PT_targets_may_overlap && a->rare().ptenv && b->rare().ptenv && !UMULT_PT_targets_may_overlap(a, b)) return false;
     const NODE *p = pointer_of(a), *q = pointer_of(b);
     if (loop && p && q && pointers_are_antialiased(p, q, loop, loop)) return false;
     if (by_type) {

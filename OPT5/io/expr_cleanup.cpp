@@ -175,7 +175,7 @@ void convert_CBRANCH_with_builtin_expect(NODE* cbranch) {
         place = &(*place)->left;
     NODE* call = *place;
     if (!call || !is_expect_call(call) || !target || target->op != LABELREF) return;
-    target->branch_hint = call->left->right->u.lval.is_zero() ? 1 : -1;
+    target->make_rare().branch_hint = call->left->right->u.lval.is_zero() ? 1 : -1;
     NODE* args = call->left;
     // The hint is taken off only where the condition's truth does not depend on the call's own type.
     NODE* value = args->left;
@@ -186,15 +186,15 @@ void convert_CBRANCH_with_builtin_expect(NODE* cbranch) {
         *place = coerce_to_type(call->type, value);
         erase_node(call);
     } else {
-        target->branch_hint = 0;
+        target->make_rare().branch_hint = 0;
     }
 }
 
 void revert_CBRANCH_with_builtin_expect(NODE* cbranch) {
     NODE* target = cbranch->right;
-    if (target->branch_hint == 0) return;
-    const int expected = target->branch_hint > 0 ? 0 : 1;
-    target->branch_hint = 0;
+    if (target->rare().branch_hint == 0) return;
+    const int expected = target->rare().branch_hint > 0 ? 0 : 1;
+    target->make_rare().branch_hint = 0;
     NODE* truth = cbranch->left;
     if (!returns_1_or_0(truth)) {
         if (!truth->type->is_int()) return;

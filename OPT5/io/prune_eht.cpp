@@ -13,7 +13,7 @@ namespace {
 // Calls stand anywhere but in the target lists of SWITCH and IF.
 void collect_calls(NODE* t, std::vector<NODE*>& calls) {
     for (; t; t = t->right) {
-        if (op_is_call(t->op) && t->eh_entry) calls.push_back(t);
+        if (op_is_call(t->op) && t->eh_entry()) calls.push_back(t);
         collect_calls(t->left, calls);
         if (t->op == SWITCH || t->op == IF) return;
     }
@@ -41,7 +41,7 @@ private:
             for (LIST* s = bb->statements; s; s = s->rest) collect_calls(s->first, calls);
         for (EHT_ITEM& item : eht)
             if (item.kind == EHK_CLEANUP) collect_calls(item.cleanup, calls);
-        for (NODE* call : calls) used[call->eh_entry] = true;
+        for (NODE* call : calls) used[call->eh_entry()] = true;
     }
 
     void mark_kept() {
@@ -69,8 +69,8 @@ private:
             eht[i].next_entry = first_kept(eht[i].next_entry);
         }
         for (NODE* call : calls) {
-            call->eh_entry = first_kept(call->eh_entry);
-            used[call->eh_entry] = true;
+            call->set_eh_entry(first_kept(call->eh_entry()));
+            used[call->eh_entry()] = true;
         }
     }
 
@@ -99,7 +99,7 @@ private:
             eht[new_ids[i]] = std::move(item);
         }
         eht.resize(count + 1);
-        for (NODE* call : calls) call->eh_entry = new_ids[call->eh_entry];
+        for (NODE* call : calls) call->set_eh_entry(new_ids[call->eh_entry()]);
     }
 
     FUNINFO* f;

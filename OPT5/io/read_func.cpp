@@ -81,7 +81,7 @@ void OPT_CLIENT::cl_expr(BASE_NODE* base, PSN* psn) {
 void OPT_CLIENT::note_references(const NODE* tree) {
     for_each_node(const_cast<NODE*>(tree), [this](const NODE* t) {
         if (t->op == LABELREF) labels_named.push_back(t->label_id());
-        if (t->eh_entry) has_exception_entries = true;
+        if (t->eh_entry()) has_exception_entries = true;
     });
 }
 
@@ -287,9 +287,9 @@ void OPT_CLIENT::check_references() {
     for_each_raw_tree(f, [=](NODE* tree) {
         for_each_node(tree, [=](NODE* t) {
             if (!op_is_call(t->op)) return;
-            if (entries <= 1) t->eh_entry = 0;
-            if (t->eh_entry >= std::max<size_t>(entries, 1))
-                refuse_input("a call names exception entry " + std::to_string(t->eh_entry));
+            if (entries <= 1) t->set_eh_entry(0);
+            if (t->eh_entry() >= std::max<size_t>(entries, 1))
+                refuse_input("a call names exception entry " + std::to_string(t->eh_entry()));
         });
     });
 }

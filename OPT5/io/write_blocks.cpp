@@ -241,7 +241,6 @@ void wrexpr(LIST* element) {
         return;
     }
     element->first = t = insert_mandatory_casts(t);
-    if (currfuninfo->profile_status == 0) t->edge_profile = NO_PROFILE;
     o_file->if_write_expr(nullptr, element->psn);
     element->first = wrtree(t);
 }

@@ -28,10 +28,10 @@ bool fits_32_bits(const NODE* t) {
 
 NODE* prepare_LABELREF(NODE* t) {
     if (t->lbl) t->u.lval = INT65(t->lbl->index);
-    if (currfuninfo->profile_status != 2 || t->edge_profile == NO_PROFILE) return t;
+    if (currfuninfo->profile_status != 2 || t->edge_profile() == NO_PROFILE) return t;
     NODE* count = maketree(EPVAL, nullptr, nullptr, t->type, t->ls);
-    count->edge_profile = t->edge_profile;
-    t->edge_profile = NO_PROFILE;
+    count->set_edge_profile(t->edge_profile());
+    t->set_edge_profile(NO_PROFILE);
     count->left = t;
     return count;
 }

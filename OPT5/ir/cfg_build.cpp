@@ -148,7 +148,7 @@ private:
             LIST* last = bb->last_statement();
             if (last->first->op == URETURN && bb != f->exit_bb) {
                 NODE* branch = mk_BRANCH(f->exit_bb, last->first->ls);
-                branch->left->edge_profile = f->entry_count;
+                branch->left->set_edge_profile(f->entry_count);
                 erase_tree(last->first);
                 last->first = branch;
             }

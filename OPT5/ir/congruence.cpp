@@ -184,7 +184,7 @@ bool same_op_is_congruent(const NODE* a, const NODE* b, bool se_ok) {
     case STASG:
     case STARG:
         if ((a->type->is_csu() || a->type->is_vector()) && !compatible_types(a->type, b->type, true)) return false;
-        return same_payload(a, b) && a->eh_entry == b->eh_entry && operands_are_congruent(a, b, se_ok);
+        return same_payload(a, b) && a->eh_entry() == b->eh_entry() && operands_are_congruent(a, b, se_ok);
     case ICALL:
     case UICALL:
     case MCALL:

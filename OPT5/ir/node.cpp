@@ -21,10 +21,29 @@
 void* NODE::operator new(std::size_t) { return record_pool<sizeof(NODE)>::take(); }
 void NODE::operator delete(void* p) { record_pool<sizeof(NODE)>::give(p); }
 
-NODE* clone_node(const NODE* t) { return new NODE(*t); }
+const RARE_FIELDS NODE::no_rare_fields;
+
+RARE_FIELDS& NODE::make_rare() {
+    if (!rare_m) rare_m = new RARE_FIELDS;
+    return *rare_m;
+}
+
+NODE* clone_node(const NODE* t) {
+    NODE* c = new NODE(*t);
+    if (!t->rare_m) return c;
+    c->rare_m = new RARE_FIELDS(*t->rare_m);
+    c->rare_m->scratch = nullptr;
+    c->rare_m->dd = nullptr;
+    c->rare_m->ptenv = nullptr;
+    c->rare_m->scratch_word = 0;
+    return c;
+}
 
 // The destructor has nothing to do and is left out, so that a pooled cell keeps the ILLOP that marks it.
-void free_node(NODE* t) { NODE::operator delete(t); }
+void free_node(NODE* t) {
+    delete t->rare_m;
+    NODE::operator delete(t);
+}
 
 // ---- Construction
 namespace {
@@ -46,7 +65,7 @@ void note_call() {
 NODE* new_node(int op, TYPE* type) {
     NODE* t = new NODE;
     t->op = op;
-    t->type = t->orig_type = type;
+    t->type = type;
     switch (op) {
     case UCALL: note_call(); break;
     case SCONV:
@@ -94,13 +113,13 @@ uint32_t NODE::label_id() const {
 int32_t NODE::vreg_id() const { return 0; }
 uint32_t NODE::skip_count() const { return u.lval.fits_in<uint32_t>(); }
 uint32_t NODE::case_count() const { return u.lval.fits_in<uint32_t>(); }
-uint32_t NODE::ddnode_id() const { return dd ? dd->id : 0; }
+uint32_t NODE::ddnode_id() const { return rare().dd ? rare().dd->id : 0; }
 uint32_t NODE::ddnode_locale() const { return 0; }
 uint8_t NODE::ddnode_flags() const { return 0; }
 uint32_t NODE::call_num_vargs() const { return u.lval.fits_in<uint32_t>(); }
 const char* NODE::icall_name() const { return u.name; }
-uint32_t NODE::eh_entry_id() const { return eh_entry; }
-uint32_t NODE::get_edge_profile_value() const { return edge_profile; }
+uint32_t NODE::eh_entry_id() const { return eh_entry(); }
+uint32_t NODE::get_edge_profile_value() const { return edge_profile(); }
 
 // The hexadecimal form holds every bit of the target's value, the decimal one need not. Infinities and NaN take the
 // words that the text conversion knows.
@@ -118,12 +137,11 @@ const char* NODE::fcon_value() const {
 }
 
 // ---- What the reader sets
-void NODE::set_edge_profile_value(uint32_t count) { edge_profile = count; }
+void NODE::set_edge_profile_value(uint32_t count) { set_edge_profile(count); }
 
 void NODE::mk_name(I_SYMTAB* sym) {
     u.sym = static_cast<SYMTAB*>(sym);
     if (!u.sym) return;
-    orig_type = u.sym->orig_type ? u.sym->orig_type : u.sym->type;
     if ((u.sym->cqual & CQ_MARKS_FUNCTION) && currfuninfo) currfuninfo->has_cqual10_name = true;
 }
 
@@ -189,13 +207,12 @@ void NODE::mk_ddnode(uint32_t, uint32_t, uint8_t) {}
 
 void NODE::mk_call(uint32_t num_vargs, uint32_t entry) {
     u.lval = INT65(num_vargs);
-    varargs = num_vargs != 0;
-    eh_entry = entry;
+    set_eh_entry(entry);
     note_call();
 }
 
 void NODE::mk_ucall(uint32_t entry) {
-    eh_entry = entry;
+    set_eh_entry(entry);
     note_call();
 }
 

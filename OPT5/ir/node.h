@@ -1,4 +1,5 @@
-// NODE: the tree node. One record serves every expression and statement kind; every node has all fields.
+// NODE: the tree node. One record serves every expression and statement kind. There are millions of them, and most walks
+// wait for memory: what few nodes need is kept in a record of its own, which a node gets when something is put there.
 //
 // A subtree has one parent. Trees are owned by the place that holds them. A node lives from `new_node` to `erase_node`,
 // which sets `op` to ILLOP and frees it, so that a walker of an erased tree stops rather than misreads.
@@ -40,9 +41,24 @@ struct DDNODE_RECORD {
     uint16_t id = 0;
 };
 
+// What few nodes need: those with a profile, and those that an analysis of loops or of SSA form is at work on.
+struct RARE_FIELDS {
+    int64_t depnum = 0;
+    double weight = -1.0;     // LABELREF profile weight, -1.0 for none
+    intptr_t branch_hint = 0; // LABELREF: below zero unlikely, above zero likely
+    NODE* ssa_args = nullptr; // SSA_PHI
+    // Of a node, not of its copies.
+    void* scratch = nullptr; // of the SSA and value propagation passes
+    DDNODE_RECORD* dd = nullptr;
+    PTENV* ptenv = nullptr;
+    uint32_t scratch_word = 0;
+};
+
 class NODE final : public BASE_NODE {
+    uint32_t number = 0; // eh_entry, or the edge's count plus 1
+
 public:
-    // `op` and `type` come from BASE_NODE.
+    // `op` and `type` come from BASE_NODE. The type as first declared is the symbol's or the member's.
     NODE* left = nullptr;
     NODE* right = nullptr;
     union U {
@@ -61,29 +77,29 @@ public:
         U() : lval() {}
     } u;
     union {
-        fkMDATA* mval; // FIELD
-        NODE* ssa_args;
-    };
-    union {
-        NODE* reach;         // SSA_USE; metavalue slot of SSA definitions
-        intptr_t branch_hint; // LABELREF: below zero unlikely, above zero likely
-    };
-    void* scratch = nullptr;   // of the SSA and value propagation passes
-    LS* ls = nullptr;          // source scope, null for none
-    int64_t depnum = 0;
-    TYPE* orig_type = nullptr; // the type as first declared
-    double weight = -1.0;      // LABELREF profile weight, -1.0 for none
-    DDNODE_RECORD* dd = nullptr;
-    union {
+        fkMDATA* mval;  // FIELD
         LBL* lbl;       // LABELREF, LABELDEF
         char* text;     // SCON bytes, ASM text, FCON print form, NAME alternative name; owned
         PRAGMA* pragma; // PPRAGMA, owned
+        NODE* reach;    // SSA_USE; metavalue slot of SSA definitions
     };
-    PTENV* ptenv = nullptr;
-    uint32_t edge_profile = NO_PROFILE; // LABELREF: count of the edge
-    uint32_t scratch_word = 0;
-    uint32_t eh_entry = 0; // CALL, UCALL: exception table entry, 0 for none
-    bool varargs = false;
+    LS* ls = nullptr; // source scope, null for none
+
+    const RARE_FIELDS& rare() const { return rare_m ? *rare_m : no_rare_fields; }
+    RARE_FIELDS& make_rare();
+    void clear_scratch() {
+        if (rare_m) rare_m->scratch = nullptr;
+    }
+
+    uint32_t eh_entry() const { return op_is_call(op) ? number : 0; } // exception table entry, 0 for none
+    void set_eh_entry(uint32_t entry) {
+        if (op_is_call(op)) number = entry;
+    }
+    // LABELREF, EPVAL: count of the edge, NO_PROFILE for none.
+    uint32_t edge_profile() const { return op == LABELREF || op == EPVAL ? number - 1 : NO_PROFILE; }
+    void set_edge_profile(uint32_t count) {
+        if (op == LABELREF || op == EPVAL) number = count + 1;
+    }
 
     // ---- BASE_NODE
     I_SYMTAB* name_symbol() const override;
@@ -136,16 +152,21 @@ private:
     friend NODE* new_node(int op, TYPE* type);
     friend NODE* clone_node(const NODE* t);
     friend void free_node(NODE* t);
-    NODE() : mval(nullptr), reach(nullptr), lbl(nullptr) {}
+    NODE() : mval(nullptr) {}
     NODE(const NODE&) = default;
     ~NODE() override = default;
+
+    RARE_FIELDS* rare_m = nullptr; // owned; null while all fields have their initial values
+    static const RARE_FIELDS no_rare_fields;
 };
+static_assert(sizeof(NODE) <= 80, "what few nodes need goes to RARE_FIELDS");
 
 // A fresh node with zeroed fields and the construction rules of calls and casts applied.
 NODE* new_node(int op, TYPE* type);
-// A plain copy of the record; the caller puts its owned parts and operands right. Used by `copy_node`.
+// A copy of the record, with what an analysis keeps of the node left out; the caller puts its owned parts and operands
+// right. Used by `copy_node`.
 NODE* clone_node(const NODE* t);
-// Gives the record back without touching what it owns. Used by `erase_node`.
+// Gives the record back, with its rare fields, but without touching what else it owns. Used by `erase_node`.
 void free_node(NODE* t);
 
 // A node with operands. SCONV, PCONV and ACONV take the type without its qualifiers.

@@ -16,7 +16,7 @@ constexpr int MAX_ROUNDS = 32;
 
 enum STATUS : uint32_t { NO_DATA, ESTIMATED, COUNTED };
 
-bool has_count(const NODE* ref) { return ref->edge_profile != NO_PROFILE; }
+bool has_count(const NODE* ref) { return ref->edge_profile() != NO_PROFILE; }
 
 } // namespace
 
@@ -29,8 +29,8 @@ void initialize_the_profiling_state(const NODE* branch) {
         if (!ref || f->entry_count != NO_PROFILE || !f->statements || f->statements->rest) return;
         if (has_count(ref)) {
             f->profile_status = COUNTED;
-            f->entry_count = ref->edge_profile;
-        } else if (ref->weight >= 0) {
+            f->entry_count = ref->edge_profile();
+        } else if (ref->rare().weight >= 0) {
             f->profile_status = ESTIMATED;
             if (print_debug) debug_printf(" This function has been STATICALLY profiled.\n");
             return;
@@ -55,12 +55,12 @@ void initialize_labelref_probabilities(NODE* control) {
     bool complete = true;
     for_each_branch_target(control, [&](const NODE* ref) {
         if (has_count(ref))
-            total += ref->edge_profile;
+            total += ref->edge_profile();
         else
             complete = false;
     });
     if (!complete || total <= 0) return;
-    for_each_branch_target(control, [total](NODE* ref) { ref->weight = ref->edge_profile / total; });
+    for_each_branch_target(control, [total](NODE* ref) { ref->make_rare().weight = ref->edge_profile() / total; });
 }
 
 namespace {
@@ -106,11 +106,11 @@ void probabilities_from_counts(BBLK* bb) {
     }
     initialize_labelref_probabilities(control);
     bool known = true;
-    for_each_branch_target(control, [&](const NODE* ref) { known &= ref->weight >= 0; });
+    for_each_branch_target(control, [&](const NODE* ref) { known &= ref->rare().weight >= 0; });
     if (!known) return predict_block(bb);
     for (EDGE* e = bb->successors; e; e = e->rest) e->prob = 0;
     for_each_branch_target(control, [bb](const NODE* ref) {
-        if (EDGE* e = edge_memberp(ref->lbl->bblock, bb->successors)) e->prob += ref->weight;
+        if (EDGE* e = edge_memberp(ref->lbl->bblock, bb->successors)) e->prob += ref->rare().weight;
     });
 }
 
@@ -148,7 +148,7 @@ uint32_t counts_out_of(const BBLK* bb) {
     if (NODE* control = bb->branch())
         for_each_branch_target(control, [&](const NODE* ref) {
             known &= has_count(ref);
-            sum += ref->edge_profile;
+            sum += ref->edge_profile();
         });
     return known && sum < NO_PROFILE ? static_cast<uint32_t>(sum) : NO_PROFILE;
 }

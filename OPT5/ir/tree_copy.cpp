@@ -46,10 +46,6 @@ static void own_payload(NODE* c) {
 static NODE* bare_copy(const NODE* t, bool keep_scope) {
     NODE* c = clone_node(t);
     if (!keep_scope) c->ls = nullptr;
-    c->ptenv = nullptr;
-    c->dd = nullptr;
-    c->scratch = nullptr;
-    c->scratch_word = 0;
     own_payload(c);
     return c;
 }
@@ -60,9 +56,10 @@ NODE* copy_node(const NODE* t, bool keep_scope) {
 
 NODE* copy_dd_node(const NODE* t, bool keep_scope) {
     NODE* c = bare_copy(t, keep_scope);
-    if (t->ptenv && ptenv_hooks.copy) c->ptenv = ptenv_hooks.copy(t->ptenv);
-    if (t->dd && (t->op == DDNODE || t->op == UMULT))
-        c->dd = new DDNODE_RECORD{nullptr, c, copy_tree(t->dd->copy), t->dd->id};
+    const RARE_FIELDS& rare = t->rare();
+    if (rare.ptenv && ptenv_hooks.copy) c->make_rare().ptenv = ptenv_hooks.copy(rare.ptenv);
+    if (rare.dd && (t->op == DDNODE || t->op == UMULT))
+        c->make_rare().dd = new DDNODE_RECORD{nullptr, c, copy_tree(rare.dd->copy), rare.dd->id};
     return c;
 }
 
@@ -150,10 +147,11 @@ static void drop_payload(NODE* t) {
     case UMCALL: free(t->u.name); break;
     case PPRAGMA: delete t->pragma; break;
     }
-    if (t->ptenv && ptenv_hooks.erase) ptenv_hooks.erase(t->ptenv);
-    if (t->dd && t->dd->node == t) {
-        erase_tree(t->dd->copy);
-        delete t->dd;
+    const RARE_FIELDS& rare = t->rare();
+    if (rare.ptenv && ptenv_hooks.erase) ptenv_hooks.erase(rare.ptenv);
+    if (rare.dd && rare.dd->node == t) {
+        erase_tree(rare.dd->copy);
+        delete rare.dd;
     }
 }
 

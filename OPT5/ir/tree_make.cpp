@@ -45,7 +45,7 @@ NODE* mk_LABELREF(LBL* lbl, uint32_t profile) {
     NODE* t = new_node(LABELREF, tp->int_t);
     t->lbl = lbl;
     t->u.lval = INT65(lbl->index);
-    t->edge_profile = profile;
+    t->set_edge_profile(profile);
     ++lbl->refcount;
     return t;
 }

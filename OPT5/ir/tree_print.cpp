@@ -362,13 +362,13 @@ void dump_payload(FILE* out, const NODE* t) {
     case ASM: fprintf(out, " \"%s\"", t->text ? t->text : ""); break;
     case PPRAGMA: fprintf(out, " %s", t->pragma ? t->pragma->name() : ""); break;
     case CALL:
-        if (t->varargs) fprintf(out, " varargs=%s", int2text(t->u.lval, nullptr, 10, 0));
+        if (!t->u.lval.is_zero()) fprintf(out, " varargs=%s", int2text(t->u.lval, nullptr, 10, 0));
         break;
     }
-    if (t->edge_profile != NO_PROFILE) fprintf(out, " profile=%u", t->edge_profile);
-    if (t->weight >= 0.0) fprintf(out, " weight=%g", t->weight);
-    if (t->depnum) fprintf(out, " depnum=%lld", static_cast<long long>(t->depnum));
-    if (t->eh_entry) fprintf(out, " eh=%u", t->eh_entry);
+    if (t->edge_profile() != NO_PROFILE) fprintf(out, " profile=%u", t->edge_profile());
+    if (t->rare().weight >= 0.0) fprintf(out, " weight=%g", t->rare().weight);
+    if (t->rare().depnum) fprintf(out, " depnum=%lld", static_cast<long long>(t->rare().depnum));
+    if (t->eh_entry()) fprintf(out, " eh=%u", t->eh_entry());
 }
 
 } // namespace

@@ -142,7 +142,6 @@ NODE* fix_type_info(NODE* tree) {
     case STDOT:
     case STREF:
         if (!tree->right || !tree->right->mval) break;
-        tree->orig_type = tree->right->mval->type;
         tree->type = merge_qualifiers_for_STDOT(tree->type, tree);
         break;
     case UMULT:
@@ -151,7 +150,6 @@ NODE* fix_type_info(NODE* tree) {
     case NAME: {
         const SYMTAB* sym = tree->u.sym;
         if (!sym || !sym->type || sym->type->is_func()) break;
-        tree->orig_type = sym->orig_type ? sym->orig_type : sym->type;
         unsigned bits = sym->type->qual_kind(false);
         bool is_static = sym->sclass == SC_EXTDEF || sym->sclass == SC_STATIC || sym->sclass == SC_EXTERN;
         if (volit_vars && is_static) bits |= QUAL_VOLATILE;

@@ -72,7 +72,6 @@ NODE* member_of(const NODE* object, fkMDATA* m) {
     field->mk_field(1, m, object->type);
     NODE* t = maketree(STDOT, copy_tree(object), field, normalized_value_type(m->type), object->ls);
     t->type = merge_qualifiers_for_STDOT(t->type, t);
-    t->orig_type = m->type;
     return t;
 }
 

@@ -321,7 +321,6 @@ NODE* member_of(const NODE* object, fkMDATA* m) {
     NODE* field = new_node(FIELD, m->type);
     field->mk_field(1, m, object->type);
     NODE* t = maketree(STDOT, copy_tree(object), field, normalized_value_type(m->type), object->ls);
-    t->orig_type = m->type;
     return t;
 }
 

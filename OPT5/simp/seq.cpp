@@ -238,7 +238,7 @@ bool entry_reaches_catch(uint32_t entry) {
 
 bool statement_may_reach_catch(NODE* t) {
     bool found = false;
-    for_each_node(t, [&](NODE* n) { found = found || (op_is_call(n->op) && entry_reaches_catch(n->eh_entry)); });
+    for_each_node(t, [&](NODE* n) { found = found || (op_is_call(n->op) && entry_reaches_catch(n->eh_entry())); });
     return found;
 }
 

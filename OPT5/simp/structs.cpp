@@ -16,7 +16,6 @@ NODE* member_of(NODE* object, fkMDATA* m) {
     field->mk_field(1, m, object->type);
     NODE* t = maketree(STDOT, object, field, normalized_value_type(m->type), object->ls);
     t->type = merge_qualifiers_for_STDOT(t->type, t);
-    t->orig_type = m->type;
     return t;
 }
 

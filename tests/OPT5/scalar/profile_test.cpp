@@ -12,8 +12,8 @@ class ProfileTest : public FunctionTest {
 protected:
     void branch_counted(SYMTAB* cond, int if_true, unsigned n, int if_false, unsigned m) {
         NODE *a = ref(if_true), *b = ref(if_false);
-        a->edge_profile = n;
-        b->edge_profile = m;
+        a->set_edge_profile(n);
+        b->set_edge_profile(m);
         add(mk_IF(mk_NAME(cond), a, b));
     }
     // if (x) x = 1 (10 times) else x = 2 (90 times); a loop of 10 rounds an entry behind it.

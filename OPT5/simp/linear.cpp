@@ -35,7 +35,7 @@ bool linear_step(const NODE* t, LINEAR_STEP* step) {
         return true;
     case MULT: {
         const NODE* c = t->right;
-        if (t->left->op == ICON) std::swap(step->a, c);
+        if (c->op != ICON) std::swap(step->a, c);
         step->by_a = low_bits(c->u.lval);
         return c->op == ICON;
     }

@@ -2,15 +2,14 @@
 //
 // A candidate is a local scalar that is read and written by its NAME alone: its address is not taken, it is not
 // volatile, and no exception entry names it. The sets are the least solution of
-//   live_out(b) = union of live_in(s) over the successors s,   live_in(b) = use(b) | (live_out(b) - def(b))
-// found by a worklist that starts with the last block in reverse postorder, so that an acyclic graph takes one visit a
-// block.
+//   live_out(b) = union of live_in(s) over the successors s,   live_in(b) = use(b) | (live_out(b) - def(b)).
 
 #include "OPT5/scalar/live_walk.h"
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/dataflow.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
@@ -88,35 +87,14 @@ void compute_use_and_def(BBLK* bb, uint32_t bits) {
     USE_DEF_WALK(bb->live_sets[LIVE_USE], bb->live_sets[LIVE_DEF]).block(bb);
 }
 
-// Whether live_in grew.
-bool update(BBLK* bb) {
-    BITVEC& out = *bb->live_sets[LIVE_OUT];
-    for (const EDGE* e = bb->successors; e; e = e->rest) out |= *e->first->live_sets[LIVE_IN];
-    BITVEC in = out;
-    in -= *bb->live_sets[LIVE_DEF];
-    in |= *bb->live_sets[LIVE_USE];
-    if (in == *bb->live_sets[LIVE_IN]) return false;
-    *bb->live_sets[LIVE_IN] = in;
-    return true;
-}
-
-void solve() {
-    BBLK* const entry = currfuninfo->bb_list;
-    std::vector<BBLK*> work;
-    for (BBLK* bb = entry; bb; bb = bb->dflink) {
-        bb->visited = true; // waiting
-        work.push_back(bb);
-    }
-    while (!work.empty()) {
-        BBLK* bb = work.back();
-        work.pop_back();
-        bb->visited = false;
-        if (!update(bb)) continue;
-        for (const EDGE* e = bb->predecessors; e; e = e->rest) {
-            if (e->first->visited) continue;
-            e->first->visited = true;
-            work.push_back(e->first);
-        }
+void solve(uint32_t bits) {
+    const DATAFLOW live(FLOW::BACKWARD, MEET::UNION, BITVEC(bits), [](const BBLK* bb, BITVEC& set) {
+        set -= *bb->live_sets[LIVE_DEF];
+        set |= *bb->live_sets[LIVE_USE];
+    });
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        *bb->live_sets[LIVE_IN] = live.at_entry(bb);
+        *bb->live_sets[LIVE_OUT] = live.at_exit(bb);
     }
 }
 
@@ -146,7 +124,7 @@ void find_live_variables(int mode, bool with_lifetimes) {
     number_candidates();
     if (f->lva_sym_count == 0) return;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) compute_use_and_def(bb, static_cast<uint32_t>(f->lva_sym_count));
-    solve();
+    solve(static_cast<uint32_t>(f->lva_sym_count));
     if (with_lifetimes) count_lifetimes();
 }
 

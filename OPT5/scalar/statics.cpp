@@ -9,6 +9,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/dataflow.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
@@ -126,28 +127,12 @@ private:
     }
 
     void find_unwritten_reads() {
-        BITVEC all(static_cast<uint32_t>(candidates.size()));
-        all.set_all();
-        std::unordered_map<const BBLK*, BITVEC> at_exit;
-        auto at_entry = [&](const BBLK* bb) {
-            BITVEC set = all;
-            if (bb == currfuninfo->bb_list) set.clear_all();
-            for (const EDGE* e = bb->predecessors; e; e = e->rest) set &= at_exit.at(e->first);
-            return set;
-        };
-        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) at_exit.emplace(bb, all);
-        for (bool again = true; again;) {
-            again = false;
-            for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-                BITVEC set = at_entry(bb);
-                for (const LIST* s = bb->statements; s; s = s->rest) statement(s->first, set, false);
-                if (set == at_exit.at(bb)) continue;
-                at_exit.at(bb) = set;
-                again = true;
-            }
-        }
+        const DATAFLOW written(FLOW::FORWARD, MEET::INTERSECTION, BITVEC(static_cast<uint32_t>(candidates.size())),
+                               [this](const BBLK* bb, BITVEC& set) {
+                                   for (const LIST* s = bb->statements; s; s = s->rest) statement(s->first, set, false);
+                               });
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-            BITVEC set = at_entry(bb);
+            BITVEC set = written.at_entry(bb);
             for (const LIST* s = bb->statements; s; s = s->rest) statement(s->first, set, true);
         }
     }

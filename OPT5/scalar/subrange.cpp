@@ -15,6 +15,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/dataflow.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -26,6 +27,7 @@
 #include "OPT5/simp/simp.h"
 
 #include <algorithm>
+#include <memory>
 #include <unordered_map>
 #include <vector>
 
@@ -132,12 +134,7 @@ public:
     bool empty() const { return bit_of.empty(); }
 
     // What is live behind the block.
-    BITVEC at_exit(const BBLK* bb) const {
-        BITVEC set = none();
-        if (empty()) return set;
-        for (const EDGE* e = bb->successors; e; e = e->rest) set |= at_entry[static_cast<size_t>(e->first->dfn)];
-        return set;
-    }
+    BITVEC at_exit(const BBLK* bb) const { return empty() ? BITVEC(0) : lives->at_exit(bb); }
 
     bool is_dead_target(const NODE* lvalue, const BITVEC& live) const {
         const int bit = bit_of_target(lvalue);
@@ -172,39 +169,26 @@ private:
         return it != bit_of.end() ? static_cast<int>(it->second) : -1;
     }
 
-    BITVEC none() const { return BITVEC(static_cast<uint32_t>(bit_of.size())); }
-
-    // In front of a block lives what it reads, and of what lives behind it that which would also reach its start.
+    // In front of a block lives what it reads, and of what lives behind it that which would also reach its start. The two
+    // are found once for each block, from nothing and from everything.
     void find_lives() {
-        renumber_bblocks();
-        const size_t n = static_cast<size_t>(currfuninfo->bb_count) + 1;
-        std::vector<BITVEC> through(n, none());
-        at_entry.assign(n, none());
+        const auto bits = static_cast<uint32_t>(bit_of.size());
+        SIDE_TABLE<BITVEC> read{BITVEC(bits)}, passed{BITVEC(bits)};
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-            BITVEC &read = at_entry[static_cast<size_t>(bb->dfn)], &passed = through[static_cast<size_t>(bb->dfn)];
-            passed.set_all();
+            passed[bb].set_all();
             for_each_statement_backward(bb, [&](NODE*& t, bool completes) {
-                pass(t, read, completes);
-                pass(t, passed, completes);
+                pass(t, read[bb], completes);
+                pass(t, passed[bb], completes);
             });
         }
-        BBLK* const entry = currfuninfo->bb_list;
-        for (bool again = true; again;) {
-            again = false;
-            for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) {
-                BITVEC& known = at_entry[static_cast<size_t>(bb->dfn)];
-                BITVEC live = at_exit(bb);
-                live &= through[static_cast<size_t>(bb->dfn)];
-                live |= known;
-                if (live == known) continue;
-                known = live;
-                again = true;
-            }
-        }
+        lives = std::make_unique<DATAFLOW>(FLOW::BACKWARD, MEET::UNION, BITVEC(bits), [&](const BBLK* bb, BITVEC& live) {
+            live &= passed[bb];
+            live |= read[bb];
+        });
     }
 
     std::unordered_map<const SYMTAB*, uint32_t> bit_of; // looked up, never walked
-    std::vector<BITVEC> at_entry;                       // by depth-first number
+    std::unique_ptr<DATAFLOW> lives;
 };
 
 // ---- Dead stores

@@ -298,7 +298,7 @@ const ROW steps[] = {
     /* 66 */ {L, "global CSE", nullptr, L2_with_branches, global_CSE, none, none},
     /* 67 */ {L, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, none, none},
     /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, rename_symbols, dominators | live_variables, graph},
-    /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, live_variables, graph},
+    /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph},
     /* 70 */ {L, "DD restructuring", nullptr, always, nothing, none, none},
     /* 71 */ {L, "expand cluster refs", nullptr, always, expand_cluster_refs, none, none},
     /* 72 */ {F, "CSU returning temp", nullptr, always, subst_csu_returning_temp_for_local_var, none, graph},

@@ -5,6 +5,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -295,6 +296,7 @@ void erase_all() {
     f->givens.clear();
     erase_eht(f);
     f->dominators.reset();
+    f->loops.reset();
     f->facts = fact::none;
     f->spmap->clear();
     f->snmap->clear();

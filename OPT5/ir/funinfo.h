@@ -21,6 +21,7 @@
 class BBLK;
 class BITVEC;
 class Dominator;
+class NATURAL_LOOPS;
 class FUNINFO;
 class NODE;
 class SNMAP;
@@ -143,6 +144,7 @@ public:
     bool is_written = false;
     FACTS facts = fact::none; // those that are true now; asked and changed through OPT5/ir/facts.h
     std::unique_ptr<Dominator> dominators;
+    std::unique_ptr<NATURAL_LOOPS> loops;
     long temp_counter = 0;
     SYMTAB* ret_by_cctor_sym = nullptr;
     SYMTAB* csu_return_sym = nullptr;

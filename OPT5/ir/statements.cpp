@@ -21,6 +21,12 @@ void insert_at_end_of_body(BBLK* bb, NODE* tree) {
     insert_before(link, tree, (*link)->psn);
 }
 
+bool ends_in_promise(const BBLK* bb) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
+    return false;
+}
+
 void drop_statement(LIST** link) {
     LIST* cell = *link;
     *link = cell->rest;

@@ -17,6 +17,10 @@ LIST* insert_behind(LIST* cell, NODE* tree, PSN* psn);
 // A new statement where the body of the block ends: ahead of the control statement and of the promises that belong to it.
 void insert_at_end_of_body(BBLK* bb, NODE* tree);
 LIST** end_of_body(BBLK* bb); // the link there
+// Whether a pragma of the block promises something of the loop that follows in the text. The promise is of that loop, by its
+// label: what stands behind one stays there, and that label stays in use. The mark of a loop's place in the source promises
+// nothing.
+bool ends_in_promise(const BBLK* bb);
 
 // Takes out the statement at the link, which is not the control statement, and erases its tree if it has one; the link is
 // then that of the next statement.

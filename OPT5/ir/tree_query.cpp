@@ -118,6 +118,14 @@ bool expr_is_globally_evaluable(const NODE* t) {
     return true;
 }
 
+bool is_magic_EH_MCALL(const NODE* t) {
+    return (t->op == MCALL || t->op == UMCALL) && !std::strcmp(t->u.name, MAGIC_EH_NAME);
+}
+
+bool tree_is_EH_SWITCH(const NODE* t) {
+    return t && t->op == SWITCH && t->left && t->left->op == UMCALL && is_magic_EH_MCALL(t->left);
+}
+
 bool tree_is_ASM_comment(const NODE* t) {
     if (t->op != ASM) return false;
     if (t->u.lval == INT65(47) || !t->text) return true;

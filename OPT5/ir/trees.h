@@ -60,6 +60,10 @@ bool tree_lists_are_congruent(const LIST* a, const LIST* b);
 bool expr_is_constant(const NODE* t);
 bool expr_is_globally_evaluable(const NODE* t);
 bool tree_is_ASM_comment(const NODE* t);
+// The call that stands for the dispatch of an exception, and the SWITCH on it, which follows a statement that may throw.
+constexpr char MAGIC_EH_NAME[] = "eh$dispatch";
+bool is_magic_EH_MCALL(const NODE* t);
+bool tree_is_EH_SWITCH(const NODE* t); // `t` may be null
 bool tree_is_arg_prolog(const NODE* t);
 bool stmt_is_arg_prolog(const LIST* stmt);
 bool tree_is_extended_arg_prolog(const NODE* t, const NODE* first);

@@ -7,7 +7,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/eda.h"
-#include "OPT5/scalar/natural_loops.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/symbolic.h"
 

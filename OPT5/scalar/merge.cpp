@@ -25,7 +25,7 @@
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/inductions.h"
 #include "OPT5/scalar/lowering.h"
-#include "OPT5/scalar/natural_loops.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -540,7 +540,7 @@ void MERGE::run() {
     const bool has_work =
         std::any_of(groups.begin(), groups.end(), [](const GROUP& g) { return g.steps || g.stays_based; });
     if (!has_work) return;
-    ahead = loops.block_ahead(loop);
+    ahead = loops.preheader(loop);
     if (!ahead) return;
     int n = 0;
     for (GROUP& g : groups) {
@@ -568,12 +568,11 @@ void merge_symbols() {
     }
     init_skewed_offset_syms();
     if (function_saves_environment()) return;
-    renumber_bblocks();
-    NATURAL_LOOPS loops;
-    need(fact::live_variables);
+    need(fact::loops | fact::live_variables);
+    NATURAL_LOOPS& loops = *currfuninfo->loops;
     if (currfuninfo->lva_sym_count) eliminate_single_use_temps();
     for (const auto& loop : loops.inner_first())
         if (loop->inside < DEEPEST) MERGE(loops, loop.get()).run();
-    changed(fact::none);
     if (loops.has_split_edges()) renumber_bblocks();
+    changed(fact::none);
 }

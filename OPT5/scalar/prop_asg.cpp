@@ -8,7 +8,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
-#include "OPT5/scalar/natural_loops.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/target/target.h"
 
 namespace {
@@ -54,7 +54,8 @@ bool has_backward_edge() {
 void count_loops_around_blocks() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->depth = 0;
     if (!has_backward_edge()) return;
-    const NATURAL_LOOPS loops;
+    need(fact::loops);
+    const NATURAL_LOOPS& loops = *currfuninfo->loops;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (const NATURAL_LOOP* loop = loops.around(bb); loop && bb->depth < UINT8_MAX; loop = loop->parent)
             ++bb->depth;

@@ -5,6 +5,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
@@ -220,14 +221,6 @@ void put_exits_behind_tests() {
 }
 
 } // namespace
-
-// What a pragma promises is promised of the loop that follows in the text, by its label: what stands behind one stays
-// there, and that label stays in use. The mark of the loop's place in the source promises nothing.
-bool ends_in_promise(const BBLK* bb) {
-    for (const LIST* s = bb->statements; s; s = s->rest)
-        if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_SRC_LOOP) return true;
-    return false;
-}
 
 void rotate_loops() {
     if (!currfuninfo->bb_list) return;

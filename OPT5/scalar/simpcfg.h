@@ -42,7 +42,5 @@ bool remove_redundant_tests();
 bool cross_jump();
 // Loops whose first test is decided are entered behind it; needs layout positions for depth-first numbers.
 bool skip_decided_entry_tests();
-// Whether a pragma of the block promises something of the loop that follows in the text.
-bool ends_in_promise(const BBLK* bb);
 bool join_diamonds();
 bool may_be_arm_of_select(const NODE* assignment); // cheap, and safe where the condition does not hold

@@ -315,10 +315,6 @@ NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through) {
     return sw;
 }
 
-bool tree_is_EH_SWITCH(const NODE* tree) {
-    return tree && tree->op == SWITCH && tree->left && tree->left->op == UMCALL && is_magic_EH_MCALL(tree->left);
-}
-
 void update_eht_labels(NODE* tree, bool negated) {
     std::vector<NODE*> cases;
     for (NODE* t = tree->right; t; t = t->op == COMMA ? t->left : nullptr) {

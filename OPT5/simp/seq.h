@@ -26,6 +26,5 @@ NODE* convert_STASG_to_asgs(NODE* tree); // a chain of COMMAOPs
 // The statement that stands for the dispatch of an exception behind a call: a SWITCH on a magic call whose cases lead
 // to the handlers. It keeps the handlers reachable while the function is optimized and is not written out.
 NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through);
-bool tree_is_EH_SWITCH(const NODE* tree);
 // Records where the cases of a dispatch lead in the catch clauses of the current function.
 void update_eht_labels(NODE* tree, bool negated);

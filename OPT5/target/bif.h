@@ -110,8 +110,6 @@ bool is_def_entry_ICALL_name(const char* name);
 bool is_def_entry_ICALL_tree(const NODE* t);
 
 // The call that stands for the dispatch of an exception, and the assignment of its value.
-constexpr char MAGIC_EH_NAME[] = "eh$dispatch";
-bool is_magic_EH_MCALL(const NODE* t);
 bool is_magic_EH_MCALL_ASG(const NODE* t);
 
 // Conditionals whose arms are both computed.

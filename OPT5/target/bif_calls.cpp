@@ -211,9 +211,6 @@ bool is_def_assert_ICALL_name(const char* name) { return !strcmp(name, "def$asse
 bool is_def_entry_ICALL_name(const char* name) { return !strcmp(name, "def$entry"); }
 bool is_def_entry_ICALL_tree(const NODE* t) { return t->op == ICALL && is_def_entry_ICALL_name(t->u.name); }
 
-bool is_magic_EH_MCALL(const NODE* t) {
-    return (t->op == MCALL || t->op == UMCALL) && !strcmp(t->u.name, MAGIC_EH_NAME);
-}
 bool is_magic_EH_MCALL_ASG(const NODE* t) { return t->op == ASG && t->right && is_magic_EH_MCALL(t->right); }
 
 // ---- Conditionals whose arms are both computed

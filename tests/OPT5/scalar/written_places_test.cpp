@@ -12,7 +12,7 @@
 #include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/scalar/merge.h"
-#include "OPT5/scalar/natural_loops.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/scalar/simpcfg.h"
 
 #include <cstring>

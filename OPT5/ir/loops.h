@@ -2,6 +2,9 @@
 //
 // A back edge leads to a block that dominates its source; the loop of a header is what reaches a back edge to it
 // without passing the header. Cycles that are entered in two places are no loops here.
+//
+// `fact::loops` keeps them in FUNINFO::loops. A pass that splits edges in the middle of its work goes on with the record
+// that it holds: the block that `preheader` makes is entered in it.
 #pragma once
 
 #include <cstddef>
@@ -9,8 +12,6 @@
 #include <vector>
 
 class BBLK;
-struct LIST;
-class NODE;
 
 struct NATURAL_LOOP {
     BBLK* header = nullptr;
@@ -32,9 +33,9 @@ public:
     bool dominates(const BBLK* a, const BBLK* b) const;
     bool dominates_latches(const BBLK* bb, const NATURAL_LOOP* loop) const;
 
-    // The block that control passes right ahead of the loop, and nowhere else leads from. Made if there is none: the
-    // numbers of the blocks are stale then. Null where that would part a promise from its loop.
-    BBLK* block_ahead(NATURAL_LOOP* loop);
+    // The block whose one successor is the header, and which every entry of the loop passes. Made if there is none: the
+    // numbers of the blocks are stale then. Null where it would stand between a pragma and the loop that it speaks of.
+    BBLK* preheader(NATURAL_LOOP* loop);
     bool has_split_edges() const { return split; }
 
 private:

@@ -1,11 +1,12 @@
-#include "OPT5/scalar/natural_loops.h"
+#include "OPT5/ir/loops.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/side_table.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
-#include "OPT5/scalar/simpcfg.h"
-#include "OPT5/simp/seq.h"
 
 #include <algorithm>
 
@@ -25,7 +26,6 @@ NATURAL_LOOPS::NATURAL_LOOPS() {
 }
 
 void NATURAL_LOOPS::number_dominator_tree() {
-    compute_dominators(false);
     int n = 0;
     currfuninfo->dominators->depth_first_doms([&](BBLK* bb) { first[slot(bb)] = ++n; },
                                               [&](BBLK* bb) { last[slot(bb)] = n; });
@@ -56,16 +56,14 @@ void NATURAL_LOOPS::find_back_edges() {
 
 void NATURAL_LOOPS::collect(NATURAL_LOOP* loop) {
     loop->blocks.push_back(loop->header);
-    loop->header->visited = true;
+    BLOCK_SET is_in;
+    is_in.add(loop->header);
     auto enter = [&](BBLK* bb) {
-        if (bb->visited || !first[slot(bb)]) return;
-        bb->visited = true;
-        loop->blocks.push_back(bb);
+        if (first[slot(bb)] && is_in.add(bb)) loop->blocks.push_back(bb);
     };
     for (BBLK* latch : loop->latches) enter(latch);
     for (size_t i = 1; i < loop->blocks.size(); ++i)
         for (const EDGE* e = loop->blocks[i]->predecessors; e; e = e->rest) enter(e->first);
-    for (BBLK* bb : loop->blocks) bb->visited = false;
     std::sort(loop->blocks.begin() + 1, loop->blocks.end(),
               [](const BBLK* a, const BBLK* b) { return a->dfn < b->dfn; });
 }
@@ -126,9 +124,9 @@ bool NATURAL_LOOPS::contains(const NATURAL_LOOP* loop, const BBLK* bb) const {
     return l != nullptr;
 }
 
-// ---- The place ahead
+// ---- Preheaders
 
-BBLK* NATURAL_LOOPS::block_ahead(NATURAL_LOOP* loop) {
+BBLK* NATURAL_LOOPS::preheader(NATURAL_LOOP* loop) {
     std::vector<BBLK*> outside;
     for (const EDGE* e = loop->header->predecessors; e; e = e->rest)
         if (!contains(loop, e->first)) outside.push_back(e->first);
@@ -152,3 +150,22 @@ BBLK* NATURAL_LOOPS::block_ahead(NATURAL_LOOP* loop) {
     for (NATURAL_LOOP* outer = loop->parent; outer; outer = outer->parent) outer->blocks.push_back(ahead);
     return ahead;
 }
+
+// ---- The fact
+
+namespace {
+
+void find(FACTS) { currfuninfo->loops = std::make_unique<NATURAL_LOOPS>(); }
+
+bool still_hold() {
+    const std::unique_ptr<NATURAL_LOOPS> known = std::move(currfuninfo->loops);
+    find(fact::loops);
+    const auto &a = known->inner_first(), &b = currfuninfo->loops->inner_first();
+    return std::equal(a.begin(), a.end(), b.begin(), b.end(), [](const auto& x, const auto& y) {
+        return x->header == y->header && x->blocks == y->blocks && x->latches == y->latches;
+    });
+}
+
+const FACT_FINDER loops("loops", fact::loops, fact::dominators, find, [] { currfuninfo->loops.reset(); }, still_hold);
+
+} // namespace

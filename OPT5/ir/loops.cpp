@@ -13,6 +13,7 @@
 size_t NATURAL_LOOPS::slot(const BBLK* bb) const { return static_cast<size_t>(bb->dfn); }
 
 NATURAL_LOOPS::NATURAL_LOOPS() {
+    need(fact::dominators);
     const auto count = static_cast<size_t>(currfuninfo->bb_count) + 1;
     original.resize(count);
     innermost.resize(count);

@@ -95,6 +95,11 @@ void erase_edge(EDGE* edge);
 void erase_edge_list(EDGE* list);
 void connect(BBLK* from, BBLK* to, double prob = -1.0); // both lists, unless it is there
 void disconnect(BBLK* from, BBLK* to);
+// The successor `from` of a block gives way to `to`, which may be one already.
+struct SUCCESSOR_CHANGE {
+    BBLK *from, *to;
+};
+void change_successors(BBLK* bb, const std::vector<SUCCESSOR_CHANGE>& changes); // one after the other; no `from` twice
 // The new block. Without `renumber` the depth-first numbers are stale: for a caller that splits many edges.
 BBLK* split_cfg_edge(BBLK* a, BBLK* b, bool renumber = true);
 void split_critical_edges(bool all);

@@ -8,6 +8,7 @@
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
+#include <unordered_map>
 
 EDGE* mkedge(BBLK* bb, EDGE* rest) { return new EDGE{bb, -1.0, rest}; }
 
@@ -113,6 +114,42 @@ void disconnect(BBLK* from, BBLK* to) {
     from->successors = remove_edge(to, from->successors);
     to->predecessors = remove_edge(from, to->predecessors);
     edges_were_changed(from->owner());
+}
+
+void change_successors(BBLK* bb, const std::vector<SUCCESSOR_CHANGE>& changes) {
+    for (EDGE* e = bb->successors; e; e = e->rest) e->first->visited = true; // a successor
+    EDGE* fresh = nullptr;
+    std::unordered_map<const BBLK*, double> prob_of; // looked up alone
+    for (const SUCCESSOR_CHANGE& c : changes) prob_of[c.from] = -1.0;
+    for (const EDGE* e = bb->successors; e; e = e->rest)
+        if (auto gone = prob_of.find(e->first); gone != prob_of.end()) gone->second = e->prob;
+    for (const SUCCESSOR_CHANGE& c : changes) {
+        c.from->visited = false;
+        c.from->predecessors = remove_edge(bb, c.from->predecessors);
+        if (c.to->visited) continue;
+        c.to->visited = true;
+        fresh = new EDGE{c.to, prob_of[c.from], fresh};
+        c.to->predecessors = new EDGE{bb, fresh->prob, c.to->predecessors};
+    }
+    EDGE** link = &bb->successors;
+    while (EDGE* e = *link) {
+        if (!prob_of.count(e->first)) {
+            e->first->visited = false;
+            link = &e->rest;
+            continue;
+        }
+        *link = e->rest;
+        delete e;
+    }
+    for (EDGE* e = fresh; e; e = e->rest) {
+        e->first->visited = false;
+        if (!e->rest) {
+            e->rest = bb->successors;
+            bb->successors = fresh;
+            break;
+        }
+    }
+    edges_were_changed(bb->owner());
 }
 
 // ---- Targets of control statements

@@ -50,7 +50,6 @@ BBLK* end_of_jumps(BBLK* via) {
 // What control statements name in place of blocks that only jump; looked up alone.
 class REPLACEMENTS {
 public:
-    bool empty() const { return to_of.empty(); }
     void add(BBLK* from, BBLK* to) {
         // The end of more jumps than are followed at once may be replaced in its turn.
         if (targets.count(from))
@@ -204,20 +203,18 @@ private:
     // Each successor that only jumps on gives way to the block that it jumps to. The control statement, which may have
     // thousands of targets, is rewritten in one walk.
     bool thread(BBLK* bb) {
-        REPLACEMENTS replacements;
-        std::vector<BBLK*> passed;
-        for (BBLK* via : successors_of(bb)) {
-            BBLK* target = end_of_jumps(via);
-            if (target == via) continue;
-            const double prob = edge_memberp(via, bb->successors)->prob;
-            disconnect(bb, via);
-            connect(bb, target, prob);
-            replacements.add(via, target);
-            passed.push_back(via);
+        std::vector<SUCCESSOR_CHANGE> changes;
+        for (const EDGE* e = bb->successors; e; e = e->rest) {
+            BBLK* target = end_of_jumps(e->first);
+            if (target != e->first) changes.push_back({e->first, target});
         }
-        if (!replacements.empty()) replacements.apply(control_of(bb)->first);
-        for (BBLK* via : passed) remove_if_unreached(via);
-        return !passed.empty();
+        if (changes.empty()) return false;
+        change_successors(bb, changes);
+        REPLACEMENTS replacements;
+        for (const SUCCESSOR_CHANGE& c : changes) replacements.add(c.from, c.to);
+        replacements.apply(control_of(bb)->first);
+        for (const SUCCESSOR_CHANGE& c : changes) remove_if_unreached(c.from);
+        return true;
     }
 
     bool take_over_successors(BBLK* bb) {

@@ -129,6 +129,34 @@ TEST_F(SimpcfgTest, ALongChainOfJumpsIsThreadedInOneGo) {
     EXPECT_TRUE(valid());
 }
 
+// Where a case ends up is a case itself, which gives way in its turn.
+TEST_F(SimpcfgTest, CasesAlongAChainOfJumpsAllReachItsEnd) {
+    SYMTAB *x = local("x"), *y = local("y");
+    constexpr int N = 100;
+    NODE* cases = nullptr;
+    for (int n = 1; n <= N; ++n)
+        cases = cases ? maketree(COMMA, cases, constant_case(n, n), tp->int_t) : constant_case(n, n);
+    add(maketree(SWITCH, mk_NAME(x), cases, tp->int_t));
+    ret(y);
+    for (int n = 1; n <= N; ++n) {
+        define(n);
+        go(n + 1);
+    }
+    define(N + 1);
+    ret(x);
+    build();
+    simpcfg(false, false);
+    EXPECT_EQ(blocks(), 3);
+    const BBLK* end = block_of(N + 1);
+    EXPECT_EQ(edge_length(end->predecessors), 1);
+    for_each_branch_target(currfuninfo->bb_list->branch(), [end, n = 0](const NODE* ref) mutable {
+        if (++n <= N) {
+            EXPECT_EQ(ref->lbl->bblock, end) << "case " << n;
+        }
+    });
+    EXPECT_TRUE(valid());
+}
+
 TEST_F(SimpcfgTest, TheFirstStatementsOfALoopDoNotJoinTheEntry) {
     SYMTAB* x = local("x");
     define(1);

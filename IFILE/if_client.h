@@ -1,4 +1,4 @@
-// IF_CLIENT: the one seam between the I-file layer and whoever uses it. The reader calls these operations as records
+// IF_CLIENT: the one interface between the I-file layer and whoever uses it. The reader calls these operations as records
 // arrive.
 //
 // Trees and symbols passed in belong to the client from then on, except where told. Texts and arrays are borrowed for

@@ -137,7 +137,7 @@ void run_workers() {
     }
 }
 
-// ---- Rounds
+// ---- From barrier to barrier
 
 bool work_remains() {
     return std::any_of(functions.begin(), functions.end(), [](SYMTAB* f) { return !steps_table[f].empty(); });

@@ -1,5 +1,5 @@
 // FUNINFO: the one record of every function ever heard of: defined, only called, named by a pragma, of the standard
-// library, and one dummy for file scope. A record is never freed; the body goes at `erase_all`.
+// library, and one dummy for file scope. A record is never freed; the body is freed by `erase_all`.
 #pragma once
 
 #include "IFILE/if_client.h"

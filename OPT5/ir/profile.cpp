@@ -10,9 +10,9 @@
 
 namespace {
 
-// A loop goes round once more. Source: T. Ball, J. R. Larus, "Branch Prediction for Free", 1993.
+// A back edge is taken. Source: T. Ball, J. R. Larus, "Branch Prediction for Free", 1993.
 constexpr double STAYS_IN_LOOP = 0.88;
-constexpr int MAX_ROUNDS = 32;
+constexpr int MAX_PASSES = 32;
 
 enum STATUS : uint32_t { NO_DATA, ESTIMATED, COUNTED };
 
@@ -69,18 +69,18 @@ namespace {
 
 bool goes_backward(const BBLK* from, const BBLK* to) { return to->dfn <= from->dfn; }
 
-// A way that stays in a loop is likely; all others are alike.
+// An edge that stays in a loop is likely; all others are alike.
 void predict_block(BBLK* bb) {
-    int ways = 0, backward = 0;
+    int edges = 0, backward = 0;
     for (const EDGE* e = bb->successors; e; e = e->rest) {
-        ++ways;
+        ++edges;
         backward += goes_backward(bb, e->first);
     }
     for (EDGE* e = bb->successors; e; e = e->rest) {
-        if (backward == 0 || backward == ways)
-            e->prob = 1.0 / ways;
+        if (backward == 0 || backward == edges)
+            e->prob = 1.0 / edges;
         else
-            e->prob = goes_backward(bb, e->first) ? STAYS_IN_LOOP / backward : (1 - STAYS_IN_LOOP) / (ways - backward);
+            e->prob = goes_backward(bb, e->first) ? STAYS_IN_LOOP / backward : (1 - STAYS_IN_LOOP) / (edges - backward);
     }
 }
 
@@ -122,11 +122,11 @@ void copy_to_predecessors() {
 
 // ---- Frequencies
 
-// The fixed point of "what comes in goes out by the probabilities", from the entry on; loops need more than one round.
+// The fixed point of "what comes in goes out by the probabilities", from the entry on; loops need more than one pass.
 void propagate_frequencies(double entry) {
     FUNINFO* f = currfuninfo;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) bb->dFreqIn = bb->dFreqOut = 0;
-    for (int round = 0; round < MAX_ROUNDS; ++round) {
+    for (int pass = 0; pass < MAX_PASSES; ++pass) {
         bool changed = false;
         for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
             double in = bb == f->bb_list ? entry : 0;

@@ -55,7 +55,7 @@ bool type_could_be_an_array(TYPE* t);
 TYPE* type_of_nth_parameter(int n, const SYMTAB* sym); // null beyond the prototype
 void type_cache_stats();
 
-// Seams for what later rooms know. Each is null until the room installs it; null gives the conservative answer.
+// Callbacks for what rooms above this one know. Each is null until the room installs it; null gives the conservative answer.
 struct TYPE_OPS_SEAMS {
     TYPE* (*builtin_return_type)(const char* name) = nullptr;
     bool (*builtin_returns_1_or_0)(const char* name) = nullptr;

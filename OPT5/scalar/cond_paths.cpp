@@ -1,13 +1,18 @@
-// Conditional paths: a test whose outcome is known on some of the ways to it, behind a few statements of its own.
+// Conditional paths: a test whose outcome is known on some of the edges into its block, behind a few statements of its own.
 //
 //     if (c) A; T; if (c) B;     becomes     if (c) { A; T; B } else { T }
 //
-// The block of the second test is copied for the ways whose outcome is known, the copy ends in a jump to where that
-// outcome leads, and the ways go to the copy. That needs the statements, the tail, to leave alone what the condition
-// reads. A test that all ways agree on, or that has no tail, needs no copy and goes with the redundant tests.
+// The block of the second test is copied for the edges whose outcome is known; the copy ends in a jump to where that
+// outcome leads, and the edges lead to the copy.
+//
+// Needs: block numbers. Leaves: a simplified graph with block numbers.
+// Sound because the statements in front of the test, the tail, are copied whole and may not change what the condition
+// reads: with `T` assigning to `c` the second test would have to be asked again. A test on whose outcome all edges agree,
+// or that has no tail, needs no copy and is removed with the redundant tests. A test that closes or heads a loop stays, so
+// that the loop keeps one entry and one back edge.
 //
 // Growth is bounded: a tail is a few nodes, all copies together a part of the function, and where size is the goal
-// there are none. A test that closes or heads a loop stays, so that the loop keeps one way in and one way back.
+// there are none.
 
 #include "OPT5/scalar/simpcfg.h"
 
@@ -30,13 +35,13 @@ namespace {
 constexpr int LARGEST_TAIL = 24;      // nodes of what is copied
 constexpr int LEAST_GROWTH = 64;      // nodes that any function may grow by
 constexpr int SHARE_OF_FUNCTION = 12; // and beyond that one in so many of its own
-constexpr int MOST_ROUNDS = 4;        // a test behind a copied one may be decided by that
+constexpr int MOST_PASSES = 4;        // a test behind a copied one may be decided by that
 constexpr int SPEED_MATTERS = 3;
 
 struct CANDIDATE {
     BBLK* bb;
-    std::vector<WAY_INTO_TEST> ways;
-    bool all; // no way's outcome is unknown
+    std::vector<DECIDED_EDGE> edges;
+    bool all; // no other edge leads into the block
 };
 
 bool may_be_copied(NODE* t) {
@@ -74,7 +79,7 @@ class COND_PATHS {
 public:
     explicit COND_PATHS(int growth) : growth_left(growth) {}
 
-    bool round() {
+    bool run_once() {
         TEST_OUTCOMES known;
         outcomes = &known;
         if (print_debug) debug_printf("-- cps search phase --\n");
@@ -96,8 +101,8 @@ private:
             if (!bb->predecessors || !bb->predecessors->rest || has_back_edge(bb)) continue;
             if (nodes_of_tail(bb) < 0 || !outcomes->ask_for(control->first->left)) continue;
             CANDIDATE c{bb, {}, false};
-            c.all = find_outcomes(*outcomes, bb, &c.ways);
-            if (!c.ways.empty()) found.push_back(c);
+            c.all = find_outcomes(*outcomes, bb, &c.edges);
+            if (!c.edges.empty()) found.push_back(c);
         }
         return found;
     }
@@ -106,7 +111,7 @@ private:
         return (outcome ? test->right->left : test->right->right)->lbl->bblock;
     }
 
-    // An earlier change may have taken ways away; those that are left lead as they did.
+    // An earlier change may have removed edges; those that are left lead where they did.
     bool qualifies(CANDIDATE& c) {
         const NODE* test = outcomes->control_of(c.bb)->first;
         outcomes->ask_for(test->left);
@@ -116,21 +121,21 @@ private:
                              tree_to_infix(test->left).c_str());
             return false;
         }
-        auto is_unfit = [&](const WAY_INTO_TEST& way) {
-            const BBLK* to = target(test, way.outcome);
-            return to->dfn <= c.bb->dfn || !edge_memberp(c.bb, way.from->successors) ||
-                   joins_selects(*outcomes, way.from, c.bb);
+        auto is_unfit = [&](const DECIDED_EDGE& edge) {
+            const BBLK* to = target(test, edge.outcome);
+            return to->dfn <= c.bb->dfn || !edge_memberp(c.bb, edge.from->successors) ||
+                   joins_selects(*outcomes, edge.from, c.bb);
         };
-        const size_t before = c.ways.size();
-        c.ways.erase(std::remove_if(c.ways.begin(), c.ways.end(), is_unfit), c.ways.end());
-        c.all &= c.ways.size() == before;
-        return !c.ways.empty();
+        const size_t before = c.edges.size();
+        c.edges.erase(std::remove_if(c.edges.begin(), c.edges.end(), is_unfit), c.edges.end());
+        c.all &= c.edges.size() == before;
+        return !c.edges.empty();
     }
 
-    // The ways of each outcome share a copy; where every way is known, those of the first keep the block itself.
+    // The edges of each outcome share a copy; where every edge is decided, those of the first outcome keep the block itself.
     bool combine(const CANDIDATE& c) {
-        const bool first = c.ways.front().outcome;
-        const bool agree = std::all_of(c.ways.begin(), c.ways.end(), [&](auto& w) { return w.outcome == first; });
+        const bool first = c.edges.front().outcome;
+        const bool agree = std::all_of(c.edges.begin(), c.edges.end(), [&](auto& e) { return e.outcome == first; });
         if (c.all && agree) return false;
         const int copies = (c.all ? 0 : 1) + (agree ? 0 : 1), nodes = nodes_of_tail(c.bb);
         if (copies * nodes > growth_left) return false;
@@ -140,8 +145,8 @@ private:
         for (bool outcome : {first, !first}) {
             if (outcome == first ? c.all : agree) continue;
             BBLK* copy = copy_tail(c.bb, to[outcome]);
-            for (const WAY_INTO_TEST& way : c.ways)
-                if (way.outcome == outcome) lead_to(way.from, c.bb, copy);
+            for (const DECIDED_EDGE& edge : c.edges)
+                if (edge.outcome == outcome) lead_to(edge.from, c.bb, copy);
         }
         if (c.all) make_branch(c.bb, outcomes->control_of(c.bb), to[first]);
         outcomes->refresh(c.bb);
@@ -176,12 +181,12 @@ void straighten_cond_paths() {
     renumber_bblocks();
     COND_PATHS paths(LEAST_GROWTH + nodes_of_function() / SHARE_OF_FUNCTION);
     bool changed = false;
-    for (int i = 0; i < MOST_ROUNDS && paths.round(); ++i) {
+    for (int i = 0; i < MOST_PASSES && paths.run_once(); ++i) {
         changed = true;
         rebuildcfg();
         simpcfg(false, false);
         renumber_bblocks();
     }
-    // What was assigned for a test that is gone would hide from the propagation of constants what the others see.
+    // An assignment that only the removed test read would make the variable look as if it had several values.
     if (changed) elim_dead_assigns(true, true);
 }

@@ -1,6 +1,6 @@
 // Structure results go where they are wanted.
 //
-// A call's result that goes to a temporary, and from there to a local, goes to the local. That holds where nothing else
+// A call's result that is stored to a temporary, and from there to a local, is stored to the local. That holds where nothing else
 // names the temporary, and neither the call nor anything outside of this function can see the local.
 //
 // A function that returns a structure through a hidden pointer, and fills a local that every path copies to where that
@@ -62,11 +62,11 @@ private:
     bool find_copies() {
         const BBLK* exit = currfuninfo->exit_bb;
         if (!exit || !exit->branch() || exit->branch()->op != URETURN) return false;
-        std::vector<const BBLK*> ways = {exit};
+        std::vector<const BBLK*> waiting = {exit};
         std::unordered_set<const BBLK*> seen = {exit};
-        while (!ways.empty()) {
-            const BBLK* bb = ways.back();
-            ways.pop_back();
+        while (!waiting.empty()) {
+            const BBLK* bb = waiting.back();
+            waiting.pop_back();
             if (bb != exit && bb->branch()->op != BRANCH) return false;
             if (bb->statements->rest) {
                 if (!ends_in_copy(bb)) return false;
@@ -74,7 +74,7 @@ private:
             }
             if (!bb->predecessors) return false;
             for (const EDGE* e = bb->predecessors; e; e = e->rest)
-                if (seen.insert(e->first).second) ways.push_back(e->first);
+                if (seen.insert(e->first).second) waiting.push_back(e->first);
         }
         return copies > 0;
     }

@@ -1,8 +1,9 @@
-// Delayed assignments: a value that only one way out of its block reads is computed there.
+// Delayed assignments: a value that only one successor of its block reads is computed on the edge to that.
 //
-// The assignment may pass what follows it in the block if nothing there names its target or changes what its value is
-// computed from. Its one read lies on the way that it moves to, so that every path computes it as often as before or
-// less.
+// Needs: live variables. Leaves: live variables; block numbers where no edge was split.
+// Sound because the assignment may pass what follows it in the block only if nothing there names its target or changes
+// what its value is computed from. Its one read lies behind the edge that it moves to, so that every path computes it as
+// often as before or less often.
 
 #include "OPT5/scalar/delay.h"
 

@@ -1,6 +1,6 @@
-// Assignments that only one way out of their block needs.
+// Assignments whose value only one successor of their block reads.
 #pragma once
 
-// Moves each to the way that needs it. Needs the live sets, and keeps them right; says whether the graph has new
+// Moves each to the edge to that successor. Needs the live sets, and keeps them right; returns whether the graph has new
 // blocks.
 bool delay_assignments();

@@ -1,7 +1,7 @@
 // Stores of a destructor to the object that dies.
 //
 // Nobody may look at the object when its destructor is done, so a store to a member only serves statements of the
-// destructor itself and what they call. It goes if none of those that can follow it may touch the member.
+// destructor itself and what they call. It is removed if none of those that can follow it may touch the member.
 
 #include "OPT5/scalar/eda.h"
 
@@ -11,6 +11,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/simp.h"
@@ -46,14 +47,11 @@ bool touched_behind(const LIST* s, const NODE* lvalue) {
 }
 
 bool touched_in_any_successor(BBLK* bb, const NODE* lvalue) {
-    clear_visited();
+    BLOCK_SET seen;
     std::vector<BBLK*> work;
-    auto add_successors = [&work](const BBLK* from) {
-        for (const EDGE* e = from->successors; e; e = e->rest) {
-            if (e->first->visited) continue;
-            e->first->visited = true;
-            work.push_back(e->first);
-        }
+    auto add_successors = [&](const BBLK* from) {
+        for (const EDGE* e = from->successors; e; e = e->rest)
+            if (seen.add(e->first)) work.push_back(e->first);
     };
     bool touched = false;
     for (add_successors(bb); !touched && !work.empty();) {
@@ -62,7 +60,6 @@ bool touched_in_any_successor(BBLK* bb, const NODE* lvalue) {
         touched = touched_behind(next->statements, lvalue);
         add_successors(next);
     }
-    clear_visited();
     return touched;
 }
 

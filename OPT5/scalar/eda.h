@@ -24,7 +24,7 @@ int live_index(const SYMTAB* sym);
 
 // ---- Dead assignments
 // Removes assignments whose value no path reads, takes assignments out of expressions, and delays those that only one
-// way out of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments went.
+// successor of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments were removed.
 // With `early` the graph is left to the caller to simplify.
 int elim_dead_assigns(bool keep_embedded, bool early);
 // In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads go.

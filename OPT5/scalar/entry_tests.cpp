@@ -75,9 +75,9 @@ private:
             if (!gives_value(t)) break;
             condition = simp_tree(with_value(condition, t->left->u.sym, t->right), nullptr);
         }
-        const NODE* ways = test->right;
+        const NODE* targets = test->right;
         BBLK* target = nullptr;
-        if (condition->op == ICON) target = (condition->u.lval.is_zero() ? ways->right : ways->left)->lbl->bblock;
+        if (condition->op == ICON) target = (condition->u.lval.is_zero() ? targets->right : targets->left)->lbl->bblock;
         erase_tree(condition);
         return target;
     }
@@ -119,7 +119,7 @@ private:
         });
     }
 
-    // The block has the one way in. Its other way out must not have been the only one to that block.
+    // The block has one predecessor. The edge that is removed must not have been the only one into its target.
     static bool decide(BBLK* bb, BBLK* target) {
         for (const EDGE* e = bb->successors; e; e = e->rest)
             if (e->first != target && !e->first->predecessors->rest) return false;

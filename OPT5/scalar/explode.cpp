@@ -56,7 +56,7 @@ struct CANDIDATE {
     SYMTAB* sym;
     std::vector<PART> parts;
     int accesses = 0, copies = 0;
-    bool goes = true;
+    bool is_exploded = true;
 
     PART* part_at(int64_t offset, TYPE* type) {
         for (PART& part : parts)
@@ -153,10 +153,10 @@ private:
     PART* part_of(const NODE* t) {
         int64_t offset;
         CANDIDATE* c = t->op == STDOT ? candidate_of(t, &offset) : nullptr;
-        return c && c->goes ? c->part_at(offset, t->type) : nullptr;
+        return c && c->is_exploded ? c->part_at(offset, t->type) : nullptr;
     }
 
-    // ---- What goes
+    // ---- Which are exploded
 
     void scan_statement(const NODE* t) {
         if (t->op != STASG || tree_is_arg_prolog(t) || !(candidate_of(t->left) || candidate_of(t->right))) {
@@ -181,11 +181,11 @@ private:
                 if (part_of(t) && !lvalue_is_volatile(t))
                     ++c->accesses;
                 else
-                    c->goes = false;
+                    c->is_exploded = false;
                 return;
             }
             if (t->op == UAND || t->op == ARGREF)
-                if (CANDIDATE* c = candidate_of(t->left)) c->goes = false;
+                if (CANDIDATE* c = candidate_of(t->left)) c->is_exploded = false;
             scan(t->right);
         }
     }
@@ -193,8 +193,8 @@ private:
     bool make_variables() {
         bool any = false;
         for (CANDIDATE& c : candidates) {
-            c.goes &= c.accesses > 0 && (c.copies == 0 || c.parts.size() <= MOST_COPIED_MEMBERS);
-            if (!c.goes) continue;
+            c.is_exploded &= c.accesses > 0 && (c.copies == 0 || c.parts.size() <= MOST_COPIED_MEMBERS);
+            if (!c.is_exploded) continue;
             any = true;
             std::string names;
             for (PART& part : c.parts) {
@@ -225,7 +225,7 @@ private:
     bool is_copy_of_candidate(const NODE* t) {
         if (t->op != STASG) return false;
         const CANDIDATE *to = candidate_of(t->left), *from = candidate_of(t->right);
-        return (to && to->goes) || (from && from->goes);
+        return (to && to->is_exploded) || (from && from->is_exploded);
     }
 
     NODE* rewritten(NODE* t) {

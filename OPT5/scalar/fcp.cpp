@@ -5,11 +5,11 @@
 //   - nothing but its NAME reaches the variable, no exception's clean-up code names it, it is not volatile;
 //   - the value reads no variable that changes once it was read. Of the NAMEs only those qualify that are assigned
 //   once,
-//     at the function's entry. An immutable variable of an inner block does not: it has another value each time round a
+//     at the function's entry. An immutable variable of an inner block does not: it has another value in each iteration of a
 //     loop, which a copy of it may outlive;
 //   - a string literal is one object, so that a pointer to one is moved, not copied.
-// All reads are replaced or none, so the assignment goes with the last of them. A value that itself names a variable
-// that is about to be replaced waits for the next round.
+// All reads are replaced or none, so the assignment is removed with the last of them. A value that itself names a variable
+// that is about to be replaced waits for the next pass.
 #include "OPT5/scalar/fcp.h"
 
 #include "OPT5/alias/address_form.h"
@@ -157,7 +157,7 @@ struct COUNTS {
 class SWEEP {
 public:
     SWEEP() { counts.max_load_factor(1.0); }
-    bool run(); // one round; true if it changed a statement
+    bool run(); // one pass; true if it changed a statement
     bool decided_a_branch = false;
 
 private:

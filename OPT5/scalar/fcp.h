@@ -1,10 +1,10 @@
-// Fast constant and copy propagation over a function, and what goes with it.
+// Fast constant and copy propagation over a function, and the joining of neighbouring assignments.
 #pragma once
 
 class NODE;
 
 // Puts the one value that a local has in the whole function in place of its reads, drops what then has no effect, and
-// lets the control-flow simplifier follow branches that became decided; at most `iterations` rounds. `combine`:
+// lets the control-flow simplifier follow branches that became decided; at most `iterations` passes. `combine`:
 // neighbouring assignments to one object in memory are joined first. Nothing at optimization level 0.
 void fast_CP(int iterations, int combine);
 

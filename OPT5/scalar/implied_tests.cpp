@@ -1,9 +1,9 @@
 // Tests that an earlier one decides.
 //
-// A condition q at the end of a block is decided on the way from an earlier IF on p if the way's side of p implies q or
-// its opposite, and nothing between the two tests changes what q reads; so it is behind an assignment of a constant to
-// the one variable that q reads. Where every way into the block is known, the test goes; where a block is nothing but
-// the test, a single way into it is led around it.
+// A condition q at the end of a block is decided on an edge behind an earlier IF on p if the side of p that leads there
+// implies q or its opposite, and nothing between the two tests changes what q reads; it is decided as well behind an
+// assignment of a constant to the one variable that q reads. Where every edge into the block is decided alike, the test
+// is removed; where a block is nothing but the test, a single edge into it is led past it.
 
 #include "OPT5/scalar/simpcfg.h"
 
@@ -173,7 +173,7 @@ bool assigns_constant(const NODE* t, const SYMTAB* sym) {
 
 } // namespace
 
-// ---- The way back
+// ---- Back along the edges
 
 TEST_OUTCOMES::TEST_OUTCOMES() : blocks(static_cast<size_t>(currfuninfo->bb_count) + 1) {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
@@ -324,14 +324,14 @@ bool joins_selects(TEST_OUTCOMES& outcomes, const BBLK* from, const BBLK* bb) {
     return before && !before->rest && arm_of_select(from, before->first, bb) && ends_in_select(outcomes, before->first);
 }
 
-bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<WAY_INTO_TEST>* ways) {
+bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<DECIDED_EDGE>* edges) {
     bool all = true;
     for (const EDGE* e = bb->predecessors; e; e = e->rest) {
-        if (static_cast<int>(ways->size()) == MAX_BLOCKS_BACK) return false;
+        if (static_cast<int>(edges->size()) == MAX_BLOCKS_BACK) return false;
         if (auto outcome = outcomes.behind_constant(e->first))
-            ways->push_back({e->first, *outcome, true});
+            edges->push_back({e->first, *outcome, true});
         else if ((outcome = outcomes.on_edge(e->first, bb)))
-            ways->push_back({e->first, *outcome, false});
+            edges->push_back({e->first, *outcome, false});
         else
             all = false;
     }
@@ -361,22 +361,22 @@ private:
         LIST* last = outcomes.control_of(bb);
         NODE* control = last->first;
         if (!is_test(control) || !bb->predecessors || !outcomes.ask_for(control->left)) return false;
-        std::vector<WAY_INTO_TEST> known;
+        std::vector<DECIDED_EDGE> known;
         const bool all = find_outcomes(outcomes, bb, &known);
         if (known.empty() || outcomes.first_that_may_change(bb)) return false;
         BBLK* targets[2] = {control->right->right->lbl->bblock, control->right->left->lbl->bblock};
         const bool first = known.front().outcome;
         if (all &&
-            std::all_of(known.begin(), known.end(), [&](const WAY_INTO_TEST& w) { return w.outcome == first; })) {
+            std::all_of(known.begin(), known.end(), [&](const DECIDED_EDGE& e) { return e.outcome == first; })) {
             make_branch(bb, last, targets[first]);
             outcomes.refresh(bb);
             return true;
         }
         if (last != bb->statements || has_back_edge(bb)) return false;
         bool changed = false;
-        for (const WAY_INTO_TEST& way : known) {
-            if (way.by_constant && joins_selects(outcomes, way.from, bb)) continue;
-            lead_around(way.from, bb, outcomes.control_of(way.from), targets[way.outcome]);
+        for (const DECIDED_EDGE& edge : known) {
+            if (edge.by_constant && joins_selects(outcomes, edge.from, bb)) continue;
+            lead_around(edge.from, bb, outcomes.control_of(edge.from), targets[edge.outcome]);
             changed = true;
         }
         return changed;

@@ -17,10 +17,10 @@ struct LIST;
 int pred_implies_pred(const NODE* p, bool sense, const NODE* q);
 
 bool is_test(const NODE* control); // an IF on a value
-// A loop's test is left where it is: a way around it would enter the loop in its middle.
+// A loop's test is left where it is: an edge that passed it would enter the loop in its middle.
 bool has_back_edge(const BBLK* bb);
 
-// What a condition is on the ways into its block. Valid while the graph of the blocks that it saw stands; blocks made
+// What a condition is on the edges into its block. Valid while the graph of the blocks that it saw stands; blocks made
 // later decide nothing. After `ask_for` the other questions are about that condition.
 class TEST_OUTCOMES {
 public:
@@ -30,10 +30,11 @@ public:
     bool ask_for(NODE* condition);    // false if nothing can be said of it; borrowed
     // At the end of `pred`, where it assigns a constant to the variable of the condition.
     std::optional<bool> behind_constant(const BBLK* pred);
-    // At the end of `pred` on the way to `bb`, by a test: back along sole predecessors, if nothing on the way changes
-    // it.
+    // On the edge from `pred` to `bb`, by an earlier test: found back along sole predecessors, if nothing between the two
+    // changes what the condition reads.
     std::optional<bool> on_edge(const BBLK* pred, const BBLK* bb);
-    // In front of the control statement, which is not looked at; a block of very many counts as one that may.
+    // The first statement of the block that may change what the condition reads, or null. The control statement is not
+    // looked at; in a very long block the last statement that was looked at is given.
     const LIST* first_that_may_change(const BBLK* bb);
 
 private:
@@ -53,13 +54,14 @@ private:
     const SYMTAB* variable = nullptr; // the only one that `q` reads
 };
 
-struct WAY_INTO_TEST {
+// An edge into the block of a test on which the test's outcome is known.
+struct DECIDED_EDGE {
     BBLK* from;
     bool outcome;
     bool by_constant; // not by a test
 };
 // Whether the test at the end of `bb` and the one that `from` comes from each only choose a value for a variable: as
-// two selects they cost no jump, which a way around the second would.
+// two selects they cost no jump, which an edge past the second would.
 bool joins_selects(TEST_OUTCOMES& outcomes, const BBLK* from, const BBLK* bb);
-// The ways into `bb` whose outcome is known; whether those are all. Of very many not all are found.
-bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<WAY_INTO_TEST>* ways);
+// Adds the edges into `bb` on which the outcome is known; returns whether those are all. Of very many not all are found.
+bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<DECIDED_EDGE>* edges);

@@ -20,7 +20,7 @@ bool is_private_scalar(const SYMTAB* sym) {
 namespace {
 
 constexpr unsigned ADDRESS_BITS = 32;
-constexpr double ROUNDS_UNKNOWN = 12;
+constexpr double TRIP_COUNT_UNKNOWN = 12;
 
 bool may_count(const SYMTAB* sym) {
     const TYPE* t = sym->type;
@@ -84,7 +84,7 @@ int64_t in_type(int64_t v, TYPE* type) { return truncate_to_type(INT65(v), type)
 
 } // namespace
 
-LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all), loop(of), estimate(ROUNDS_UNKNOWN) {
+LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all), loop(of), estimate(TRIP_COUNT_UNKNOWN) {
     usable = loop->is_reducible;
     if (usable) collect_assignments();
     if (!usable) return;
@@ -94,7 +94,7 @@ LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all),
     find_starts();
     find_tests();
     judge_wrapping();
-    estimate_rounds();
+    estimate_trip_count();
 }
 
 // ---- What is assigned
@@ -157,7 +157,7 @@ INDUCTION* LOOP_FACTS::induction(const SYMTAB* sym) {
     return it == inductions.end() ? nullptr : &it->second;
 }
 
-// ---- Values of a round
+// ---- Values within an iteration
 
 const LOOP_FACTS::DEFINITION* LOOP_FACTS::definition(const SYMTAB* sym) const {
     auto it = definitions.find(sym);
@@ -170,12 +170,12 @@ void LOOP_FACTS::look_at(const BBLK* bb, const NODE* statement) {
     looking_at = place.at(statement);
 }
 
-// The steps end their round: from each control goes to the header.
+// The steps end their iteration: behind each, control passes to the header.
 void LOOP_FACTS::order_steps() {
-    steps_end_rounds = true;
+    steps_end_iterations = true;
     for (const INDUCTION* i : in_order)
         for (const INDUCTION::STEP& s : i->steps) {
-            steps_end_rounds &= !s.bb->successors->rest && s.bb->successors->first == loop->header;
+            steps_end_iterations &= !s.bb->successors->rest && s.bb->successors->first == loop->header;
             int& first = first_step.emplace(s.bb, place.at(s.statement)).first->second;
             first = std::min(first, place.at(s.statement));
         }
@@ -183,7 +183,7 @@ void LOOP_FACTS::order_steps() {
 
 const NODE* LOOP_FACTS::value_of(const SYMTAB* sym) {
     const DEFINITION* d = is_induction(sym) ? nullptr : definition(sym);
-    if (!d || !steps_end_rounds) return nullptr;
+    if (!d || !steps_end_iterations) return nullptr;
     if (auto step = first_step.find(looking_in); step != first_step.end() && step->second < looking_at) return nullptr;
     const bool comes_first =
         d->bb == looking_in ? place.at(d->statement) < looking_at : loops.dominates(d->bb, looking_in);
@@ -288,14 +288,14 @@ void LOOP_FACTS::find_starts() {
 
 // ---- Tests
 
-bool LOOP_FACTS::runs_once_a_round(const BBLK* bb) const {
+bool LOOP_FACTS::runs_once_in_each_iteration(const BBLK* bb) const {
     return loops.around(bb) == loop && loops.dominates_latches(bb, loop);
 }
 
 void LOOP_FACTS::find_tests() {
     for (BBLK* bb : loop->blocks) {
         NODE* branch = bb->branch();
-        if (!branch || branch->op != IF || !op_is_int_compare(branch->left->op) || !runs_once_a_round(bb)) continue;
+        if (!branch || branch->op != IF || !op_is_int_compare(branch->left->op) || !runs_once_in_each_iteration(bb)) continue;
         const NODE* compare = branch->left;
         LOOP_TEST test;
         test.bb = bb;
@@ -311,7 +311,7 @@ void LOOP_FACTS::find_tests() {
         test.limit = limit;
         if (!limit->type->is_int() || !counter->type->is_int() || limit->type->size != counter->type->size ||
             test.counter->steps.size() != 1 || test.counter->steps.front().amount ||
-            !runs_once_a_round(test.counter->steps.front().bb))
+            !runs_once_in_each_iteration(test.counter->steps.front().bb))
             continue;
         const BBLK *yes = branch->right->left->lbl->bblock, *no = branch->right->right->lbl->bblock;
         if (loops.contains(loop, yes) == loops.contains(loop, no)) continue;
@@ -344,11 +344,11 @@ bool stays(int op, int64_t value, int64_t limit) {
 
 } // namespace
 
-int64_t constant_rounds(const LOOP_TEST& test, int64_t* last_value) {
+int64_t constant_trip_count(const LOOP_TEST& test, int64_t* last_value) {
     const INDUCTION& i = *test.counter;
     if (!i.start_is_known || test.limit->op != ICON || !test.limit->u.lval.fits<int32_t>()) return -1;
     const int64_t by = i.steps.front().by, limit = in_type(test.limit->u.lval.fits_in<int32_t>(), i.sym->type);
-    int64_t value = i.start + (test.step_comes_first ? by : 0), rounds = test.step_comes_first ? 1 : 0;
+    int64_t value = i.start + (test.step_comes_first ? by : 0), trips = test.step_comes_first ? 1 : 0;
     if (stays(test.stay_op, value, limit)) {
         const int64_t distance = by > 0 ? limit - value : value - limit, size = by > 0 ? by : -by;
         int64_t more = 0;
@@ -369,11 +369,11 @@ int64_t constant_rounds(const LOOP_TEST& test, int64_t* last_value) {
         }
         if (distance < 0) return -1; // runs away from its limit
         value += more * by;
-        rounds += more;
+        trips += more;
     }
     if (stays(test.stay_op, value, limit) || in_type(value, i.sym->type) != value) return -1;
     *last_value = value;
-    return rounds;
+    return trips;
 }
 
 // An unsigned counter does not wrap where each step follows a test that leaves room for it, or the first step follows a
@@ -386,7 +386,7 @@ void LOOP_FACTS::judge_wrapping() {
         INDUCTION& i = *test.counter;
         int64_t last;
         if (!i.wraps) continue;
-        if (constant_rounds(test, &last) >= 0) {
+        if (constant_trip_count(test, &last) >= 0) {
             i.wraps = false;
             continue;
         }
@@ -406,9 +406,9 @@ void LOOP_FACTS::judge_wrapping() {
     }
 }
 
-void LOOP_FACTS::estimate_rounds() {
+void LOOP_FACTS::estimate_trip_count() {
     int64_t last;
     for (const LOOP_TEST& test : exits)
-        if (const int64_t n = constant_rounds(test, &last); n >= 0)
-            estimate = std::min(estimate == ROUNDS_UNKNOWN ? 1000.0 : estimate, static_cast<double>(n));
+        if (const int64_t n = constant_trip_count(test, &last); n >= 0)
+            estimate = std::min(estimate == TRIP_COUNT_UNKNOWN ? 1000.0 : estimate, static_cast<double>(n));
 }

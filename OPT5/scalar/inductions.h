@@ -1,4 +1,4 @@
-// What moves in a natural loop, and how often the loop runs.
+// Induction variables of a natural loop, its exit tests, and its trip count.
 #pragma once
 
 #include "OPT5/scalar/linear_address.h"
@@ -30,11 +30,11 @@ struct INDUCTION {
     bool wraps = true;               // a narrow unsigned one: not shown not to
 };
 
-// A test that leaves the loop, once in each round.
+// A test that may leave the loop and is evaluated once in each iteration.
 struct LOOP_TEST {
     BBLK* bb = nullptr;
     NODE* branch = nullptr;       // the IF
-    INDUCTION* counter = nullptr; // which has one step in each round, by a constant
+    INDUCTION* counter = nullptr; // which has one step in each iteration, by a constant
     const NODE* limit = nullptr;  // invariant
     int stay_op = 0;              // the loop goes on while `counter stay_op limit`
     bool stays_if_true = false;   // of the compare as it stands
@@ -44,12 +44,12 @@ struct LOOP_TEST {
 class LOOP_FACTS final : public LINEAR_LEAVES {
 public:
     LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of);
-    // False for a loop that is better left alone: it holds what is not understood, or can be entered in another way.
+    // False for a loop that is better left alone: it holds what is not understood, or has another entry than its header.
     bool is_usable() const { return usable; }
     INDUCTION* induction(const SYMTAB* sym);
     const std::vector<INDUCTION*>& all_inductions() const { return in_order; }
     const std::vector<LOOP_TEST>& tests() const { return exits; }
-    double rounds() const { return estimate; }
+    double trip_count_estimate() const { return estimate; }
     int mentions(const SYMTAB* sym) const;       // NAMEs in the loop
     bool is_used_after(const SYMTAB* sym) const; // its value may be read where the loop is left
 
@@ -57,7 +57,7 @@ public:
     bool is_induction(const SYMTAB* sym) const override { return inductions.count(sym) != 0; }
     bool is_invariant(const NODE* tree) override;
     // Of a variable with one assignment in the loop, at the statement that `look_at` named: what that assigned in the
-    // same round, if no induction has stepped since.
+    // same iteration, if no induction has stepped since.
     const NODE* value_of(const SYMTAB* sym) override;
     void look_at(const BBLK* bb, const NODE* statement);
     struct DEFINITION {
@@ -75,9 +75,9 @@ private:
     void order_steps();
     void find_starts();
     void find_tests();
-    bool runs_once_a_round(const BBLK* bb) const;
+    bool runs_once_in_each_iteration(const BBLK* bb) const;
     void judge_wrapping();
-    void estimate_rounds();
+    void estimate_trip_count();
     bool is_unchanged(const SYMTAB* sym, const NODE* name);
 
     const NATURAL_LOOPS& loops;
@@ -95,12 +95,12 @@ private:
     const BBLK* looking_in = nullptr;
     int looking_at = 0;
     std::unordered_map<const BBLK*, int> first_step; // its place
-    bool steps_end_rounds = false;
+    bool steps_end_iterations = false;
     int questions_left = 16; // each looks at the whole loop
 };
 
 // Whether only its NAME reads and writes a local scalar.
 bool is_private_scalar(const SYMTAB* sym);
-// The constant number of rounds that a test allows, or -1; `first` gets the counter's value at the first test that
+// The constant trip count that a test allows, or -1; `first` gets the counter's value at the first test that
 // leaves the loop.
-int64_t constant_rounds(const LOOP_TEST& test, int64_t* last_value);
+int64_t constant_trip_count(const LOOP_TEST& test, int64_t* last_value);

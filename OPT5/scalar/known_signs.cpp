@@ -18,7 +18,7 @@
 
 namespace {
 
-constexpr int MOST_ROUNDS = 8, MOST_LEVELS = 16;
+constexpr int MOST_PASSES = 8, MOST_LEVELS = 16;
 
 bool is_signed_integer(const TYPE* t) { return t->is_int() && t->is_signed() && !t->is_bool(); }
 
@@ -38,7 +38,7 @@ KNOWN_SIGNS::KNOWN_SIGNS() {
         });
     });
     bool again = true;
-    for (int round = 0; again && round < MOST_ROUNDS; ++round) {
+    for (int pass = 0; again && pass < MOST_PASSES; ++pass) {
         again = false;
         for (const DEFINITION& d : definitions)
             if (nonnegative.count(d.sym) && !(d.assignment && keeps_nonnegative(d.assignment)))

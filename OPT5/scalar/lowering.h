@@ -24,7 +24,7 @@ void convert_sti_to_cinit();
 // Lays the locals of disjoint scopes out in one aggregate.
 void build_stack_sharing_type();
 
-// The temporary that takes a structure result gives way to the variable that it is copied to.
+// The temporary that takes a structure result is replaced by the variable that it is copied to.
 void subst_csu_returning_temp_for_local_var();
 
 // Simplifier forms that the code generator does not want are undone.

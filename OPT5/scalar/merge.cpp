@@ -4,12 +4,12 @@
 // at the address's value ahead of the loop and is stepped right beside each step of an induction. So the pointer and
 // the address are equal between any two statements of the loop, however often and under whatever condition the
 // induction steps. Addresses that differ by a constant share a pointer; the others have an offset from it. Where the
-// steps would cost more than they save, the invariant part of the address alone goes ahead of the loop.
+// steps would cost more than they save, the invariant part of the address alone is computed ahead of the loop.
 //
 // What is computed ahead of the loop is arithmetic on variables and addresses, which cannot fail; no load moves.
 //
 // A counter that nothing needs but its own step and the test that leaves the loop gives its test to a pointer. The test
-// becomes one for inequality, which holds in arithmetic that wraps: with a step of one, or a known number of rounds,
+// becomes one for inequality, which holds in arithmetic that wraps: with a step of one, or a known trip count,
 // the pointer meets its last value exactly.
 #include "OPT5/scalar/merge.h"
 
@@ -48,7 +48,7 @@ struct USE {
     BBLK* bb;
     NODE* statement;
     LINEAR_ADDRESS address;
-    double weight; // executions in a round
+    double weight; // executions in an iteration
     int nodes;     // of the address
 };
 
@@ -56,8 +56,8 @@ struct GROUP {
     std::vector<USE> uses;
     LINEAR_ADDRESS address; // the lowest of the uses
     TYPE* type = nullptr;   // the pointer's
-    double step_gain = 0;   // of a pointer that steps, in a round
-    double base_gain = 0;   // of a variable for the part that stays, in a round
+    double step_gain = 0;   // of a pointer that steps, in an iteration
+    double base_gain = 0;   // of a variable for the part that stays, in an iteration
     double entry_cost = 0;
     double step_growth = 0, base_growth = 0; // nodes of code
     bool steps = false, stays_based = false;
@@ -263,7 +263,7 @@ bool may_grow(double nodes) { return nodes <= 0 || size_speed_goal() > 1; }
 const GROUP* MERGE::carrier(const LOOP_TEST& test) const {
     const INDUCTION& i = *test.counter;
     int64_t last;
-    const int64_t rounds = constant_rounds(test, &last), by = i.steps.front().by;
+    const int64_t trips = constant_trip_count(test, &last), by = i.steps.front().by;
     for (const GROUP& g : groups) {
         const int64_t k = g.address.coefficient_of(i.sym);
         if (k == 0) continue;
@@ -274,7 +274,7 @@ const GROUP* MERGE::carrier(const LOOP_TEST& test) const {
         if (!only || base_moves) continue;
         // Different counts give different addresses.
         const int64_t size = k < 0 ? -k : k;
-        const bool is_short = rounds >= 0 && rounds < 32768 && by > -32768 && by < 32768;
+        const bool is_short = trips >= 0 && trips < 32768 && by > -32768 && by < 32768;
         if (size == 1 || (size < 32768 && i.sym->type->size == 16) || (size == 2 && is_short)) return &g;
     }
     return nullptr;
@@ -287,7 +287,7 @@ bool MERGE::counter_can_go(const LOOP_TEST& test) {
     const int64_t by = test.counter->steps.front().by;
     const bool is_up = test.stay_op == LT || test.stay_op == LE || test.stay_op == ULT || test.stay_op == ULE;
     const bool is_down = test.stay_op == GT || test.stay_op == GE || test.stay_op == UGT || test.stay_op == UGE;
-    if (constant_rounds(test, &last) < 0) {
+    if (constant_trip_count(test, &last) < 0) {
         // A limit that is met exactly, or passed before the first test.
         if (test.stay_op != NEQ && !(is_up && by == 1) && !(is_down && by == -1)) return false;
         if (test.step_comes_first && !test.counter->start_is_known) return false;
@@ -305,12 +305,12 @@ bool MERGE::counter_can_go(const LOOP_TEST& test) {
 }
 
 double MERGE::gain_of_counter(const LOOP_TEST& test) {
-    double gain = COUNTER_COST * facts.rounds() - (test.limit->op == ICON ? 3 : 10);
+    double gain = COUNTER_COST * facts.trip_count_estimate() - (test.limit->op == ICON ? 3 : 10);
     size_t pointers = 0;
     for (const GROUP& g : groups) {
         if (g.address.is_induction_by(test.counter->sym)) {
             ++pointers;
-            if (!g.steps) gain += g.step_gain * facts.rounds() - g.entry_cost;
+            if (!g.steps) gain += g.step_gain * facts.trip_count_estimate() - g.entry_cost;
         } else
             pointers += g.steps;
     }
@@ -318,16 +318,16 @@ double MERGE::gain_of_counter(const LOOP_TEST& test) {
 }
 
 void MERGE::choose() {
-    const double rounds = facts.rounds();
+    const double trips = facts.trip_count_estimate();
     std::vector<GROUP*> order;
     for (GROUP& g : groups) order.push_back(&g);
     std::stable_sort(order.begin(), order.end(),
                      [](const GROUP* a, const GROUP* b) { return a->step_gain > b->step_gain; });
     size_t pointers = 0;
     for (GROUP* g : order) {
-        g->steps = g->step_gain * rounds > g->entry_cost && g->step_gain >= g->base_gain && pointers < MOST_POINTERS &&
+        g->steps = g->step_gain * trips > g->entry_cost && g->step_gain >= g->base_gain && pointers < MOST_POINTERS &&
                    may_grow(g->step_growth);
-        g->stays_based = !g->steps && g->base_gain * rounds > g->entry_cost && may_grow(g->base_growth);
+        g->stays_based = !g->steps && g->base_gain * trips > g->entry_cost && may_grow(g->base_growth);
         pointers += g->steps;
     }
     for (const LOOP_TEST& test : facts.tests()) {
@@ -444,7 +444,7 @@ void MERGE::rewrite(GROUP& g) {
     step_beside(g);
 }
 
-// The part that stays goes ahead of the loop.
+// The part that stays is computed ahead of the loop.
 void MERGE::rewrite_with_base(GROUP& g) {
     const LINEAR_ADDRESS stays = without_inductions(g.address, facts);
     g.sym = make_pointer(g.type, stays, tree_of_address(stays, g.type));
@@ -466,7 +466,7 @@ NODE* MERGE::last_address(const LOOP_TEST& test, const GROUP& g) {
     TYPE* type = i.sym->type->stqs();
     const int64_t by = i.steps.front().by, k = g.address.coefficient_of(i.sym);
     int64_t last;
-    if (constant_rounds(test, &last) >= 0) {
+    if (constant_trip_count(test, &last) >= 0) {
         NODE* value = mk_ICON(INT65(last), type);
         NODE* address = tree_of_address(g.address, g.type, i.sym, value);
         erase_tree(value);

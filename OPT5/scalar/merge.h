@@ -7,7 +7,7 @@ class SYMTAB;
 void rename_symbols();
 void merge_symbols();
 
-// A variable of the current function that is like `sym`, the n-th of it; with what is known of a pointer.
+// A new local with the type and scope of `sym`, whose name is told apart by `n`. What is known of a pointer is copied.
 SYMTAB* clone_symbol(SYMTAB* sym, int n);
 
 // Computes the value of a variable that is set once and read once where it is read. The bits of the candidates stand.

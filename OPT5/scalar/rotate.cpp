@@ -1,4 +1,9 @@
-// Layout of loops, ahead of the output.
+// Layout of loops, ahead of the output: one conditional branch closes a loop.
+//
+// Needs: block numbers, which are layout positions here. Leaves: them.
+// Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does not
+// fall into its successor. What a pragma promises of the loop behind it in the text is the one thing that layout could
+// break, so no block moves in between.
 
 #include "OPT5/scalar/simpcfg.h"
 
@@ -26,7 +31,15 @@ bool holds_LOOP(const BBLK* bb) {
     return false;
 }
 
-// The neighbours' numbers below stand for layout positions: after `renumber_bblocks` a block's dfn is its place.
+// A loop whose test stands on top, in the layout
+//
+//     A          falls into the loop
+//     B .. C     the test; C leads out, to F
+//     D .. E     the body; E jumps back to B
+//     F          what follows, if anything
+//
+// becomes A, D .. E, B .. C, F: A jumps to B once, and C closes the loop with its conditional branch back to D. A block's
+// dfn is its place in the layout.
 class ROTATION {
 public:
     explicit ROTATION(BBLK* end) : E(end) {}
@@ -80,7 +93,7 @@ private:
         return highest;
     }
 
-    // Whether a way leads from `bb` back to B by way of E.
+    // Whether control can come from `bb` to E, which leads back to B, without passing B.
     bool is_in_loop(const BBLK* bb) const {
         std::unordered_set<const BBLK*> seen{B, E};
         std::vector<const BBLK*> work{E};
@@ -94,8 +107,7 @@ private:
         return false;
     }
 
-    // The block whose way leads to F, the loop's test on top; without a next block, the nearest one before E that
-    // control does not fall out of.
+    // C: the last block ahead of E that leads to F; where nothing follows, the nearest one ahead of E that leads out.
     BBLK* end_of_stretch() const {
         if (F) {
             BBLK* highest = nullptr;
@@ -111,6 +123,7 @@ private:
         return nullptr;
     }
 
+    // B: of the blocks up to C that E leads to, the last.
     BBLK* start_of_stretch() const {
         BBLK* highest = nullptr;
         for (const EDGE* e = E->successors; e; e = e->rest)
@@ -138,7 +151,7 @@ const NODE* test_on_top(const BBLK* bb) {
     return test->first;
 }
 
-// Its copy takes the jump's place: one conditional branch a round instead of a test and a jump.
+// Its copy takes the jump's place: one conditional branch in each iteration instead of a test and a jump.
 void close_loops_by_tests() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
         if (bb->is_in_LIR_form()) continue;
@@ -182,7 +195,7 @@ void move_run(BBLK* first, BBLK* last, BBLK* behind) {
     (next ? next : entry)->rdflink = last;
 }
 
-// A body that ends in a jump ahead to its loop's test costs that jump in each round. Where nothing falls into it, it
+// A body that ends in a jump ahead to its loop's test costs that jump in each iteration. Where nothing falls into it, it
 // moves in front of the test, and what stood there jumps once.
 void put_bodies_before_tests() {
     std::vector<BBLK*> jumps;
@@ -200,8 +213,8 @@ void put_bodies_before_tests() {
     }
 }
 
-// A test neither way of which is the next block costs a jump on one of them. Where the way out of a loop is fallen into
-// from nowhere, it moves here, and the way that stays in the loop is one conditional branch.
+// A test neither of whose targets is the next block costs a jump on one of its edges. Where no block falls into the one
+// that the loop is left to, that moves behind the test, and staying in the loop takes one conditional branch.
 void put_exits_behind_tests() {
     std::vector<BBLK*> tests;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
@@ -212,7 +225,7 @@ void put_exits_behind_tests() {
     }
     for (BBLK* bb : tests) {
         BBLK *exit = bb->successors->first, *stay = bb->successors->rest->first;
-        // Of two ways back the nearer stays in the inner loop.
+        // Of two back edges the one to the nearer header stays in the inner loop.
         if (stay->dfn > bb->dfn || (exit->dfn <= bb->dfn && exit->dfn > stay->dfn)) std::swap(exit, stay);
         if (falls_through(bb) || stay->dfn > bb->dfn) continue; // moved meanwhile, or no loop
         BBLK* last = end_of_run(exit, bb);

@@ -1,10 +1,10 @@
 // The control-flow simplifier.
 //
-// One round visits the blocks from the last to the first, so that a branch is threaded over blocks whose own branches
+// One pass visits the blocks from the last to the first, so that a branch is threaded over blocks whose own branches
 // are threaded already, and from the first to the last, so that a block takes over a whole chain of successors. A
 // change can make another one possible (a merged block holds a constant test, a dead block leaves its successor one
-// predecessor), so rounds go on until nothing changes; each change removes a block, an edge or a control statement, and
-// there are few rounds in practice. Control statements are cached by depth-first number, since a block's list must be
+// predecessor), so passes go on until nothing changes; each change removes a block, an edge or a control statement, and
+// there are few passes in practice. Control statements are cached by depth-first number, since a block's list must be
 // walked to find its last.
 
 #include "OPT5/scalar/simpcfg.h"
@@ -23,7 +23,7 @@
 
 namespace {
 
-constexpr int MAX_THREADING_ROUNDS = 20;
+constexpr int MAX_THREADED_JUMPS = 20;
 
 // Where a block leads that holds nothing but a jump; null for any other block. The entry stays, since nothing may jump
 // to the block behind it in its place, and so does a block that jumps to itself.
@@ -38,7 +38,7 @@ BBLK* bypass_of(const BBLK* bb) {
 // The block that a jump to `via` gets to in the end; `via` itself if that does more than jump, and in a ring of jumps.
 BBLK* end_of_jumps(BBLK* via) {
     BBLK* target = via;
-    for (int round = 0; round < MAX_THREADING_ROUNDS; ++round) {
+    for (int jump = 0; jump < MAX_THREADED_JUMPS; ++jump) {
         BBLK* next = bypass_of(target);
         if (!next) break;
         target = next;
@@ -72,7 +72,7 @@ private:
 
 bool is_written_as_do(const PRAGMA* p) { return p->kind == PRG_SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
 
-// A loop that has nothing but its test left, which stood on top, evaluates that once more than it went round: a pragma
+// A loop that has nothing but its test left, which stood on top, evaluates that once more than it has iterations: a pragma
 // in front of it promised something of the iterations, and a reader would take it for the tests.
 void drop_promises_of(BBLK* loop) {
     for (const EDGE* e = loop->predecessors; e; e = e->rest) {
@@ -157,7 +157,7 @@ private:
     LIST*& control_of(const BBLK* bb) { return controls[bb->dfn]; }
     bool is_live(const BBLK* bb) { return control_of(bb) != nullptr; }
 
-    // A block without predecessors goes, and with it the successors whose last predecessor it was. The objects stay for
+    // A block without predecessors is removed, and with it the successors whose last predecessor it was. The objects stay for
     // `rebuildcfg`, which also finds the rings that nothing enters.
     void remove(BBLK* bb) {
         std::vector<BBLK*> work{bb};
@@ -200,7 +200,7 @@ private:
         return list;
     }
 
-    // Each successor that only jumps on gives way to the block that it jumps to. The control statement, which may have
+    // Each successor that only jumps on is replaced by the block that it jumps to. The control statement, which may have
     // thousands of targets, is rewritten in one walk.
     bool thread(BBLK* bb) {
         std::vector<SUCCESSOR_CHANGE> changes;

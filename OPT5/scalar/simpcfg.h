@@ -28,7 +28,7 @@ void straighten_traces_in_cfg();
 void straighten_cond_paths();
 void optimize_superblocks_in_cfg();
 
-// Tells the loops' annotations how often they go round, from the profile.
+// Gives the loops' annotations their trip counts from the profile.
 void add_loop_annotation_from_profile();
 
 // ---- Used between the files of the control-flow simplifier. Each returns whether it changed the graph, and leaves

@@ -109,7 +109,7 @@ namespace {
 constexpr uint32_t DEEPEST_RECORD = 12;
 constexpr uint32_t OUTERMOST_BLOCK = 2;
 
-// What never changes does so where another object lies in its place.
+// An object that is const or volatile keeps its storage for itself: another object in its place would change it.
 bool holds_const_or_volatile(TYPE* t) {
     if (t->is_const() || t->is_volatile()) return true;
     while (t->is_array()) t = t->raw_elem_type();

@@ -7,7 +7,7 @@
 // judge by types too, the first store must be one that a read of the second's type could not miss.
 //
 // Structures and arrays of the frame that only their own name can reach have a life like that of a variable, which
-// spans blocks: a backward analysis with a bit for each. A store to any part of one that is dead behind it goes.
+// spans blocks: a backward analysis with a bit for each. A store to any part of one that is dead behind it is removed.
 
 #include "OPT5/scalar/subrange.h"
 

@@ -1,6 +1,6 @@
 // Switches whose control value is known to lie in a small range.
 //
-// Bounds, a common factor and bits that are always zero tell which values can occur. A case of another value goes;
+// Bounds, a common factor and bits that are always zero tell which values can occur. A case of another value is removed;
 // where all values that can occur have a case, the default is never taken and the code generator need not test the
 // bounds. The bounds come from the tree itself and from the assertions of the block that hold where the switch is
 // evaluated.

@@ -225,7 +225,7 @@ private:
         BBLK* entry = currfuninfo->bb_list;
         LIST* first = entry->statements;
         if (tree_is_arg_prolog(first->first)) return start_bb = split_block(entry, first, false);
-        // Without parameters the start is all of the block; what it is split behind goes again.
+        // Without parameters the start is all of the block; the empty statement that it is split behind is removed again.
         insert_before(&entry->statements, nullptr, first->psn);
         start_bb = split_block(entry, entry->statements, false);
         drop_statement(&entry->statements);
@@ -345,7 +345,7 @@ private:
 
     std::vector<PARAMETER> parms;
     std::vector<BBLK*> calls;
-    std::vector<BBLK*> conditional; // return what is an own call on some way
+    std::vector<BBLK*> conditional; // return what is a call of the function itself on some path
     bool returns_truth = false;
     BBLK* start_bb = nullptr;
 };

@@ -1,4 +1,4 @@
-// Traces: the order of blocks in the output follows the likeliest way.
+// Traces: the order of blocks in the output follows the likeliest path.
 //
 // Seeds are blocks by descending frequency. A trace grows from its seed along the likeliest edge, forward and then
 // backward, over blocks that no trace has yet. The traces stand in the order of their seeds, but the one that holds the
@@ -91,7 +91,7 @@ void grow(SBLK* trace) {
     while (trace->head != currfuninfo->bb_list) {
         BBLK* before = likeliest(trace->head->predecessors, false);
         if (!before || before->trace) break;
-        // It must go here most likely itself, or another trace wants it more.
+        // A block whose likeliest successor is another one belongs to that one's trace.
         if (likeliest(before->successors, true) != trace->head) break;
         trace->add_basic_block_in_front(before);
     }

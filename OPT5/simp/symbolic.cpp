@@ -135,7 +135,7 @@ bool expr_product_may_overflow(const NODE* tree, struct LOOP* loop) {
     return false;
 }
 
-// ---- Seams
+// ---- Callbacks
 
 void install_symbolic_seams() {
     type_ops_seams.calculate_bounds = calculate_bounds;

@@ -34,7 +34,7 @@ SYMTAB* sort_stack_variables(SYMTAB* list);
 extern void (*prepare_allocation_hook)();
 void allocate_regs(); // the pass, over the current function
 
-// The factor, at least 1, by which a loop of one block pays to be unrolled: a divisor of `count`, its number of rounds.
+// The factor, at least 1, by which a loop of one block pays to be unrolled: a divisor of `count`, its trip count.
 // `statements` are its body, of which the last is the branch.
 INT65 loop_unrolling_factor(const LIST* statements, INT65 count);
 

@@ -1,7 +1,7 @@
 // Promises of how often a loop iterates, held against how often it does.
 //
 // The promise stands before the label that heads the loop. The loop is all that leads back to the head without leaving
-// what the head dominates; each way back is an iteration more, and the statement by which the loop is left tells
+// what the head dominates; each back edge is an iteration more, and the statement by which the loop is left tells
 // whether the last iteration began.
 #pragma once
 
@@ -26,5 +26,5 @@ private:
     void left(const TRIP_PROMISE& p, uint64_t backs, uint32_t from, MACHINE& m) const;
 
     const FUNCTION& f_m;
-    std::vector<uint64_t> backs_m; // ways back since the loop was entered
+    std::vector<uint64_t> backs_m; // back edges since the loop was entered
 };

@@ -34,7 +34,7 @@ struct FINDING {
     explicit operator bool() const { return !what.empty(); }
 };
 
-// Conditions that hold wherever a tree stands, and which variables change from one round of its loop to the next.
+// Conditions that hold wherever a tree stands, and which variables change from one iteration of its loop to the next.
 // Stands in for a loop of the optimizer.
 class SURROUNDINGS {
 public:

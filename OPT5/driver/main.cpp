@@ -47,7 +47,6 @@ bool optimize_unit(int argc, char** argv) {
     init_fileopts();
     init_BIF_descriptors();
     init_simplifier();
-    init_allocation_seam();
     setup_passes(true);
     if (pass_debug_parser) {
         parse_md_file(false);

@@ -37,6 +37,8 @@ const ROW rows[] = {
     {F,     "combine assignments",    nullptr, always, combine_asgs_to_memory, none, graph},
     {F,     "switch cases",           nullptr, always, optimize_SWITCH_cases, none, graph},
     {FIXED, "register definitions",   nullptr, always, [] { init_reg_defs(); }, none, graph},
+    {F,     "lower addresses",        nullptr, always, lower_addresses, none, graph},
+    {F,     "assignments into tests", nullptr, always, propagate_assignments_into_tests, live_variables, graph},
     {F,     "allocate registers",     nullptr, always, allocate_regs, none, graph},
     {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, live_variables, graph},
     {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, graph},

@@ -39,7 +39,9 @@ void remove_unneeded_stores_from_destructor();
 // Puts the assignment in front of a test into it, where the test compares the variable with a constant: the value need not be
 // read again. Needs the bits of the candidates.
 void prop_asg_into_if(BBLK* bb);
-void init_allocation_seam(); // once: lets `allocate_regs` ask for it
+// The same in every block, ahead of register allocation; also counts the loops around each block, in BBLK::depth. Needs
+// `fact::live_variables`.
+void propagate_assignments_into_tests();
 
 // ---- Assignments inside expressions become statements of their own, in front of where they stood
 void promote_all_embedded_assignments();

@@ -61,14 +61,12 @@ void count_loops_around_blocks() {
             ++bb->depth;
 }
 
-void prepare_allocation() {
-    need(fact::live_variables);
+} // namespace
+
+void propagate_assignments_into_tests() {
+    if (!currfuninfo->bb_list) return;
     count_loops_around_blocks();
     BBLK* const entry = currfuninfo->bb_list;
     for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) prop_asg_into_if(bb);
     changed(fact::graph);
 }
-
-} // namespace
-
-void init_allocation_seam() { prepare_allocation_hook = prepare_allocation; }

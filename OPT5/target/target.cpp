@@ -138,15 +138,15 @@ NODE* lower_address(NODE* t) {
 
 } // namespace
 
-void (*prepare_allocation_hook)() = nullptr;
-
-void allocate_regs() {
+void lower_addresses() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LIST* stmt = bb->statements; stmt; stmt = stmt->rest)
             stmt->first = rewrite_tree(stmt->first, lower_address);
     sym_split(currfuninfo);
+}
+
+void allocate_regs() {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'allocate_regs' ----------\n");
-    if (prepare_allocation_hook && currfuninfo->bb_list) prepare_allocation_hook();
     init_reg_defs();
     for (SYMTAB* list : {currfuninfo->new_syms, currfuninfo->scalar_syms, currfuninfo->memory_syms})
         sort_stack_variables(list); // the last holds the structures

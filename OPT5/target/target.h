@@ -30,8 +30,7 @@ long cost_for_DIV_to_MULT_expr(const NODE* t);
 
 // Gives the automatic variables that can lie anywhere on the stack their class and number. Returns the list.
 SYMTAB* sort_stack_variables(SYMTAB* list);
-// The data flow's part of `allocate_regs`, installed at start-up; null where there is none.
-extern void (*prepare_allocation_hook)();
+void lower_addresses(); // of every statement of the current function, into the forms that instructions take
 void allocate_regs(); // the pass, over the current function
 
 // The factor, at least 1, by which a loop of one block pays to be unrolled: a divisor of `count`, its trip count.

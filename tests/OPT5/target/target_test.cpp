@@ -115,6 +115,7 @@ TEST_F(Target, AddressesAreLoweredAheadOfRegisterAssignment) {
     for (const auto& c : cases) list = mkelist(c.tree, list, nullptr);
     bb->statements = list = reverse_list(list);
     currfuninfo->bb_list = bb;
+    lower_addresses();
     allocate_regs();
     currfuninfo->bb_list = nullptr;
     for (const auto& c : cases) {

@@ -20,7 +20,6 @@ public:
     const std::string& name() const { return name_m; }
     const std::string& text() const { return text_m; } // the value as it was written; empty without one
 
-
     static std::map<std::string, register_option*>& objects();
     static register_option* get_option(const std::string& name); // null if there is none
     static std::map<std::string, int> get_state();

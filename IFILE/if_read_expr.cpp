@@ -33,7 +33,7 @@ void I_FILE::if_read_expr_field(BASE_NODE* node) {
     node->mk_field(kind, member, csu);
 }
 
-// A constant has 32 bits in the file; the type says which way they extend.
+// A constant has 32 bits in the file; the type says whether the sign or zeros extend them.
 void I_FILE::if_read_expr_icon(BASE_NODE* node) {
     if (node->type && node->type->is_signed())
         node->mk_icon(static_cast<int32_t>(i_read_sint()));

@@ -330,7 +330,7 @@ void I_FILE::write_csu_type_lists(TYPE* type) {
 // ---- Order
 
 namespace {
-// The types that the record of `type`, with the list that goes with it, names.
+// The types that the record of `type`, and of its list name.
 void collect_parts(TYPE* type, std::vector<TYPE*>& parts) {
     switch (type->kind) {
     case TYPE::tpk_fixed:

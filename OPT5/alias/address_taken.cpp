@@ -1,7 +1,7 @@
 // Which objects something other than their own name may reach.
 //
 // A mark that is missing makes every later answer wrong, so whatever is not understood marks. What keeps an object
-// unmarked: all its accesses go through its NAME, or, for an array, through an address from which
+// unmarked: all its accesses are by its NAME, or, for an array, through an address from which
 // `object_name_if_known` finds the array again.
 #include "OPT5/alias/alias.h"
 
@@ -24,8 +24,8 @@ namespace {
 
 bool is_plain_array(const TYPE* type) { return type->is_array() && !type->is_vector(); }
 
-// What the function in work adds to the marks of the program. Those stand in the symbols; a function names few of all, so
-// that only its own marks are taken back.
+// What the function in work adds to the marks of the program. Those stand in the symbols; a function names few of all,
+// so that only its own marks are taken back.
 std::vector<SYMTAB*> marked_globals;
 
 void mark(SYMTAB* sym) {
@@ -175,9 +175,9 @@ bool marks_still_hold() {
 
 const FACT_FINDER marks("aliased objects", fact::alias_marks, fact::none, find_marks, nullptr, marks_still_hold,
                         fact::pointees | fact::pointer_groups);
-const FACT_FINDER pointers("what pointers point into", fact::pointees | fact::pointer_groups, fact::alias_marks,
-                           [](FACTS wanted) { find_pointers(wanted, pointer_writes(currfuninfo)); },
-                           [] { currfuninfo->spmap->clear(); });
+const FACT_FINDER pointers(
+    "what pointers point into", fact::pointees | fact::pointer_groups, fact::alias_marks,
+    [](FACTS wanted) { find_pointers(wanted, pointer_writes(currfuninfo)); }, [] { currfuninfo->spmap->clear(); });
 
 } // namespace
 

@@ -84,7 +84,7 @@ bool are_told_apart_by_records(const NODE* a, const NODE* b) {
 
 namespace {
 
-// Its block is the function's, so that there is one life of it; an inner block begins anew each time round a loop.
+// Its block is the function's, so that there is one life of it; an inner block begins anew at each iteration of a loop.
 bool lives_once(const PTR* p) { return p->scope->depth <= 2 && p->scope->function == currfuninfo; }
 
 // The record of an lvalue's pointer if that is `restrict` and keeps the value that it was declared with.
@@ -163,7 +163,8 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     if (object_b && is_out_of_reach(object_b, a, x)) return false;
     if (accesses_are_disjoint(x, y, loop)) return false;
     if (are_kept_apart(a, b, loop != nullptr) || are_told_apart_by_records(a, b)) return false;
-    if (UMULT_PT_targets_may_overlap && a->rare().ptenv && b->rare().ptenv && !UMULT_PT_targets_may_overlap(a, b)) return false;
+    if (UMULT_PT_targets_may_overlap && a->rare().ptenv && b->rare().ptenv && !UMULT_PT_targets_may_overlap(a, b))
+        return false;
     const NODE *p = pointer_of(a), *q = pointer_of(b);
     if (loop && p && q && pointers_are_antialiased(p, q, loop, loop)) return false;
     if (by_type) {

@@ -1,5 +1,5 @@
 // The known alignment of an access: that of the object or of what its pointer was declared to point to, as far as the
-// offsets added to it keep it. The wrappers OUIALIGN and NONALIGN take back what a pointer's type promises.
+// offsets added to it keep it. The wrappers OUIALIGN and NONALIGN take back what a pointer's type guarantees.
 #include "OPT5/alias/alias.h"
 
 #include "OPT5/alias/address_form.h"
@@ -20,7 +20,7 @@ unsigned at_least_a_unit(INT65 bits) {
 
 unsigned alignment_of(const TYPE* type) { return std::max(UNIT, type->align); }
 
-unsigned type_promise(const NODE* pointer) {
+unsigned type_guarantee(const NODE* pointer) {
     return pointer->type->is_pointer() ? alignment_of(pointer->type->type_pointed_to()) : UNIT;
 }
 
@@ -36,7 +36,7 @@ unsigned alignment_of_form(const ADDRESS_FORM& form, bool trusted) {
     for (const LINEAR_FORM::TERM& term : form) {
         const INT65 scale = term.coefficient < 0 ? -INT65(term.coefficient) : INT65(term.coefficient);
         const bool is_base = term.tree->type->is_pointer() && scale == INT65(UNIT);
-        g = long_gcd(g, is_base && trusted ? INT65(type_promise(term.tree)) : scale);
+        g = long_gcd(g, is_base && trusted ? INT65(type_guarantee(term.tree)) : scale);
     }
     return at_least_a_unit(g);
 }
@@ -56,7 +56,7 @@ unsigned nonaligned_pointee_alignment(const NODE* pointer, struct LOOP*) {
 
 unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop) {
     const unsigned known = nonaligned_pointee_alignment(pointer, loop);
-    return is_marked_unaligned(pointer) ? known : std::max(known, type_promise(pointer));
+    return is_marked_unaligned(pointer) ? known : std::max(known, type_guarantee(pointer));
 }
 
 unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop) {

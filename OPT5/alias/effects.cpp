@@ -170,7 +170,7 @@ bool byref_arg_is_not_assigned_thru(int index, SYMTAB* callee) {
     FUNINFO* f = callee ? find_FUNINFO(callee) : nullptr;
     if (!f) return false;
     if (TEST_FLAG(f, FUN_no_byref_asg)) return true;
-    // `const` is a promise that a cast may break, except by the library.
+    // `const` can be cast away, except by the library.
     if (!TEST_FLAG(f, FUN_is_SYSTEM)) return false;
     const TYPE* type = type_of_nth_parameter(index, callee);
     return type && type->is_pointer() && type->type_pointed_to()->is_const();
@@ -204,9 +204,8 @@ bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
 bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {
     if (tree_modifies_lvalue(a, lvalue)) return true;
     if (any_lvalue_read(a, [lvalue](const NODE* t) { return lvalues_may_be_aliased(t, lvalue); })) return true;
-    return any_subtree(a, [lvalue](const NODE* t) {
-        return is_operation_on_memory(t->op) && call_may_read(t, lvalue);
-    });
+    return any_subtree(a,
+                       [lvalue](const NODE* t) { return is_operation_on_memory(t->op) && call_may_read(t, lvalue); });
 }
 
 bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t) {
@@ -254,7 +253,8 @@ READ_SET::READ_SET(const NODE* tree) {
 const SYMTAB* READ_SET::only_variable() const {
     if (indirect || symbols.empty()) return nullptr;
     const SYMTAB* first = symbols.front();
-    return std::all_of(symbols.begin(), symbols.end(), [first](const SYMTAB* s) { return s == first; }) ? first : nullptr;
+    return std::all_of(symbols.begin(), symbols.end(), [first](const SYMTAB* s) { return s == first; }) ? first
+                                                                                                        : nullptr;
 }
 
 bool READ_SET::may_be_changed(const WRITE& w) const {

@@ -22,7 +22,7 @@ struct WRITE {
 };
 
 // Whether the node itself acts on what pointers reach: calls, copies of memory, assembly. Its operands are not looked
-// at; a call that promises to write nothing counts as none.
+// at; a call that is known to write nothing counts as none.
 bool may_write_indirectly(const NODE* node);
 // The place that the pointer of a copy points to, where the tree shows it, or null.
 const NODE* place_of_pointer(const NODE* pointer);

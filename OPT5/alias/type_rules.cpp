@@ -87,7 +87,7 @@ TYPE* declared_pointee(const NODE* p) {
 
 TYPE* type_of_indirection(const NODE* t) {
     TYPE* declared = t->right ? nullptr : declared_pointee(t->left);
-    // A cast on the way may stand for another access than the variable below it was declared for.
+    // A cast in between may stand for another access than the variable below it was declared for.
     if (declared && (is_character(declared->real) || equiv_mtypes(declared, t->type))) return declared;
     return is_narrow_integer(t->type) ? tp->schar_t : t->type;
 }

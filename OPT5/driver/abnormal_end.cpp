@@ -38,7 +38,7 @@ void end_debug_stream(const char* message) {
 }
 
 [[noreturn]] void end_abnormally(const char* message) {
-    // A second failure on the way out must not start over.
+    // A second failure while the run ends must not start over.
     static bool ending = false;
     if (ending) std::_Exit(1);
     ending = true;

@@ -1,7 +1,7 @@
 // The words of the command line, and the option sets that they and the I-file make together.
 //
 // A set is built from the I-file's strings first; then every option of the command line is applied to it and wins: what
-// conflicts with it in the set gives way in silence.
+// conflicts with it in the set is dropped without a message.
 #include "BANNER/banner.h"
 #include "IFILE/pragma.h"
 #include "OPT5/driver/driver.h"

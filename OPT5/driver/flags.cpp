@@ -112,7 +112,7 @@ void set_global_flags(option_obj* options) {
         pointer_args_are_disjoint = 1;
     }
     if (dwim_loops) loop_increments_are_not_zero = 1;
-    // Without optimization nothing is promised about aliases, whatever else was asked for.
+    // Without optimization no guarantee about aliases is taken, whatever else was asked for.
     if (is_level_off_or_0(current_options())) alias_vars_option = 1;
     for (const option_obj* set : all_option_sets)
         if (is_level_off_or_0(set)) inhibit_clustering = 1;
@@ -124,7 +124,7 @@ void init_fileopts() {
     constexpr int writers[4] = {0, 0, 1, 1};
     if (opt_level() <= 2) program_mode = 0;
     if (program_mode < 0) {
-        // Nothing was promised about the rest of the program.
+        // There is no guarantee about the rest of the program.
         no_outside_callers = no_outside_writers = 0;
     } else {
         no_outside_callers = program_mode < 4 ? callers[program_mode] : 1;

@@ -121,7 +121,7 @@ void run(int argc, char** argv) {
 } // namespace
 
 int zopt_main(int argc, char** argv) {
-    // A reader of our standard output that goes away is no reason to leave half an output file.
+    // A reader of our standard output that closes early is no reason to leave half an output file.
     std::signal(SIGPIPE, SIG_IGN);
     register_reserved_switches();
     install_abort_behaviour();

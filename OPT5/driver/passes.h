@@ -1,4 +1,4 @@
-// The numbered steps that every function goes through, and the order they run in.
+// The numbered steps that are run on every function, and the order they run in.
 #pragma once
 
 #include "OPT5/driver/pipeline.h"

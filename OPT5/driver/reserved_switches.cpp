@@ -49,7 +49,6 @@ register_option pass_debug_parsemd("debug:parsemd");
 register_option pass_debug_synrules("debug:synrules");
 
 register_option pass_disable_downcounters("disable:downcounters");
-register_option pass_disable_fcprevsymtab("disable:fcprevsymtab");
 register_option pass_disable_ilp("disable:ilp");
 register_option pass_disable_inline_folding("disable:inline_folding");
 register_option pass_disable_inline_profiled("disable:inline_profiled");

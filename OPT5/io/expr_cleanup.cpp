@@ -1,8 +1,8 @@
 // The first clean-up of a tree just read.
 //
 // The parser's trees name declarations, count loops down and scale pointers with forms of their own. Afterwards a NAME
-// refers to the definition, node types are the optimizer's (normalized, enumerations as their integers), loops are labels
-// and conditional branches, and pointer scaling is plain multiplication.
+// refers to the definition, node types are the optimizer's (normalized, enumerations as their integers), loops are
+// labels and conditional branches, and pointer scaling is plain multiplication.
 
 #include "OPT5/io/read.h"
 
@@ -42,7 +42,8 @@ void retype_arguments(NODE* call) {
         NODE* arg = list->op == COMMA ? list->right : list;
         if (!arg || (arg->op != ARGREF && arg->op != STARG) || !arg->left) continue;
         TYPE* type = arg->left->type;
-        if (compatible_types(arg->type, type, true) && !(arg->type->qual_kind(false) & ~type->qual_kind(false))) arg->type = type;
+        if (compatible_types(arg->type, type, true) && !(arg->type->qual_kind(false) & ~type->qual_kind(false)))
+            arg->type = type;
     }
 }
 
@@ -55,7 +56,7 @@ NODE* cleanup_LOOP(NODE* t) {
     return def;
 }
 
-// Counts down and goes back while the counter, before the step, was not 0.
+// Counts down and branches back while the counter, before the step, was not 0.
 NODE* cleanup_ENDLOOP(NODE* t) {
     NODE* counter = t->left;
     TYPE* type = counter->type;
@@ -109,9 +110,7 @@ NODE* part_to_VFIELD(NODE* t) {
 NODE* cleanup_node(NODE* t) {
     if (t->type->kind != TYPE::tpk_void) t->type = normalized_value_type(t->type);
     switch (t->op) {
-    case NAME:
-        t->u.sym = get_sym_def_for_decl(t->u.sym);
-        return t;
+    case NAME: t->u.sym = get_sym_def_for_decl(t->u.sym); return t;
     case UAND: note_address_taken(t); return t;
     case CALL: retype_arguments(t); return t;
     case LOOP: return cleanup_LOOP(t);
@@ -159,19 +158,21 @@ namespace {
 constexpr char BUILTIN_EXPECT[] = "__builtin_expect";
 
 bool is_expect_call(const NODE* t) {
-    return t->op == ICALL && !std::strcmp(t->u.name, BUILTIN_EXPECT) && arg_list_count(t->left) == 2 && t->left->right->op == ICON;
+    return t->op == ICALL && !std::strcmp(t->u.name, BUILTIN_EXPECT) && arg_list_count(t->left) == 2 &&
+           t->left->right->op == ICON;
 }
 
 } // namespace
 
-// `CBRANCH(expect(c, k), L)`, or with the call compared against 0: the condition becomes `c`, and L, where a false condition
-// goes, is likely when k is 0 and unlikely otherwise.
+// `CBRANCH(expect(c, k), L)`, or with the call compared against 0: the condition becomes `c`, and L, where a false
+// condition goes, is likely when k is 0 and unlikely otherwise.
 void convert_CBRANCH_with_builtin_expect(NODE* cbranch) {
     NODE* target = cbranch->right;
     NODE** place = &cbranch->left;
     NODE* test = *place;
     if (test && test->op == NEQ && test->right->op == ICON && test->right->u.lval.is_zero()) place = &test->left;
-    while (*place && (*place)->op == SCONV && (*place)->type->is_int() && (*place)->type->size >= (*place)->left->type->size)
+    while (*place && (*place)->op == SCONV && (*place)->type->is_int() &&
+           (*place)->type->size >= (*place)->left->type->size)
         place = &(*place)->left;
     NODE* call = *place;
     if (!call || !is_expect_call(call) || !target || target->op != LABELREF) return;
@@ -200,7 +201,8 @@ void revert_CBRANCH_with_builtin_expect(NODE* cbranch) {
         if (!truth->type->is_int()) return;
         truth = maketree(NEQ, truth, mk_ICON(INT65(0), truth->type), tp->int_t, truth->ls);
     }
-    NODE* args = maketree(COMMA, coerce_to_type(tp->long_t, truth), mk_ICON(INT65(expected), tp->long_t), tp->long_t, truth->ls);
+    NODE* args =
+        maketree(COMMA, coerce_to_type(tp->long_t, truth), mk_ICON(INT65(expected), tp->long_t), tp->long_t, truth->ls);
     NODE* call = mk_ICALL(BUILTIN_EXPECT, args, tp->long_t);
     cbranch->left = maketree(NEQ, call, mk_ICON(INT65(0), tp->long_t), tp->int_t, truth->ls);
 }

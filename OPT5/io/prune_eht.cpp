@@ -1,4 +1,5 @@
-// Pruning of a function's exception table: entries that no call reaches go, chains skip what does nothing, ids close up.
+// Pruning of a function's exception table: entries that no call reaches are removed, chains skip what does nothing, ids
+// close up.
 
 #include "OPT5/io/write.h"
 

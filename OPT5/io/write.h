@@ -12,7 +12,7 @@ struct LBL;
 struct LIST;
 
 // Ahead of writing the current function: locals that nothing names any more are not declared to the code generator; the
-// operand that stood for the state of the machine goes.
+// operand that stood for the state of the machine is removed.
 void drop_unused_locals();
 void strip_implicit_states();
 // The records of the current function. Its blocks are consumed.
@@ -24,8 +24,8 @@ void write_func_header();
 void write_func_body();
 void wrbblocks();
 void wrexpr(LIST* element);
-void wrbdlr(const LBL* labels);  // a label record for each label that is referenced
-NODE* wrtree(NODE* tree);        // the pre-write walk, then the tree's records; returns what the tree became
+void wrbdlr(const LBL* labels);             // a label record for each label that is referenced
+NODE* wrtree(NODE* tree);                   // the pre-write walk, then the tree's records; returns what the tree became
 NODE* prepare_tree_for_writing(NODE* tree); // the pre-write walk alone
 void wrasmr(int kind, const char* text, PSN* psn); // 47 a comment, 36 inline assembly
 void wrstcr(int kind, PSN* psn);                   // a control record

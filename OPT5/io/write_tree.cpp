@@ -66,7 +66,7 @@ NODE* prepare_call(NODE* t) {
     return t;
 }
 
-// The writer follows operands, the reader counts them: the two operands of an assertion go under one list.
+// The writer follows operands, the reader counts them: the two operands of an assertion are put under one list.
 NODE* prepare_ASSERT(NODE* t) {
     if (!t->right) return t;
     t->left = maketree(COMMA, t->left, t->right, tp->int_t, t->ls);
@@ -94,7 +94,8 @@ NODE* prepare_node(NODE* t) {
         if (t->type->size > 32 && !fits_32_bits(t)) t->op = LCON;
         return t;
     case UAND:
-        if (t->left->op == NAME && t->left->u.sym->is_function()) unsuppress_inline_function(make_FUNINFO(t->left->u.sym));
+        if (t->left->op == NAME && t->left->u.sym->is_function())
+            unsuppress_inline_function(make_FUNINFO(t->left->u.sym));
         return t;
     case CALL:
     case UCALL: return prepare_call(t);

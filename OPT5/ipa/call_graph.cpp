@@ -43,8 +43,8 @@ void sort_by_name() {
     }
 }
 
-// A promise holds if it holds for everything that is called, to the end of every chain.
-void close_promises(const std::vector<FUNINFO*>& list) {
+// A guarantee holds if it holds for everything that is called, to the end of every chain.
+void close_guarantees(const std::vector<FUNINFO*>& list) {
     for (bool changed = true; changed;) {
         changed = false;
         for (FUNINFO* f : list)
@@ -213,7 +213,7 @@ void set_up_and_build_call_graph() {
     sort_by_name();
     const std::vector<FUNINFO*> list = defined_functions();
     add_synonym_edges();
-    close_promises(list);
+    close_guarantees(list);
     add_anonymous_edges(list);
     for (FUNINFO* f : list) classify_callees(f);
     check_program_mode();

@@ -1,7 +1,7 @@
 // Whole-file facts: the call graph, and what each function and global may do and suffer.
 //
 // Every definition is scanned once, when it has been read. The barrier steps then close the facts over the call graph,
-// so that what a flag promises holds for everything a call may set off.
+// so that what a flag guarantees holds for everything a call may set off.
 #pragma once
 
 #include <cstdint>
@@ -60,7 +60,7 @@ void scan_for_calls_and_uses(NODE* tree);
 void preprocess_fundef(FUNINFO* f); // a definition has been read
 void scan_for_funinfo(NODE* tree, bool value_unused, FUNINFO* f, bool in_prolog);
 void scan_for_funinfo(NODE* initializer_item);
-void check_fun_for_byref_asgs(SYMTAB* sym); // drops the promise about parameters where no parameter is a pointer
+void check_fun_for_byref_asgs(SYMTAB* sym); // drops the guarantee about parameters where no parameter is a pointer
 void add_call_edge(FUNINFO* caller, FUNINFO* callee, bool value_unused);
 bool propagate_call_flags(FUNINFO* caller, FUNINFO* callee); // whether the caller's flags changed; null: anything
 // A body that only passes its parameters on to another function makes the two synonyms.

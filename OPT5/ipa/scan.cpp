@@ -1,8 +1,8 @@
 // One scan of a function's body: what it calls, reads and writes, and how large it is.
 //
-// The function starts with every promise ("assigns no global", ...), and the scan clears those that the body breaks. A
-// call breaks what the callee does not promise; a callee that has not been read yet promises what the reader knows of
-// it.
+// The function starts with every guarantee ("assigns no global", ...), and the scan clears those that the body breaks.
+// A call breaks what the callee does not guarantee; a callee that has not been read yet guarantees what the reader
+// knows of it.
 
 #include "OPT5/ipa/progana.h"
 
@@ -351,7 +351,8 @@ void add_call_edge(FUNINFO* caller, FUNINFO* callee, bool value_unused) {
     // A function may call thousands of others. What nobody calls yet is on no list, and of the file's roots, which are
     // entered one after the other, only the last may come again.
     CALLEE* last = caller->callees;
-    const bool is_new = !TEST_FLAG(callee, FUN_is_called) || (caller == program.file_fun && !(last && last->callee == callee));
+    const bool is_new =
+        !TEST_FLAG(callee, FUN_is_called) || (caller == program.file_fun && !(last && last->callee == callee));
     if (is_new)
         caller->callees = new CALLEE{callee, 1, last};
     else
@@ -367,8 +368,8 @@ void add_call_edge(FUNINFO* caller, FUNINFO* callee, bool value_unused) {
 
 bool propagate_call_flags(FUNINFO* caller, FUNINFO* callee) {
     if (caller == callee) return false;
-    const uint64_t before = get_flags(caller), promised = callee ? get_flags(callee) : 0;
-    uint64_t broken = ASSUMPTIONS & ~promised;
+    const uint64_t before = get_flags(caller), guaranteed = callee ? get_flags(callee) : 0;
+    uint64_t broken = ASSUMPTIONS & ~guaranteed;
     if (broken & FUN_no_byref_asg) broken |= FUN_no_ind_asg;
     clear_flags(caller, broken);
     return get_flags(caller) != before;

@@ -2,5 +2,5 @@
 #pragma once
 
 // Writes `<input>.gdl` beside the input: a node a function, an edge a pair of caller and callee, labelled with its
-// calls. A file that cannot be written is reported on stderr; the run goes on.
+// calls. A file that cannot be written is reported on stderr; the run continues.
 void view_call_graph();

@@ -45,7 +45,7 @@ namespace {
 
 constexpr int32_t LOWEST_INTERNAL_LABEL = -30000;
 
-// Numbers may repeat in a function of more labels than that; references go by the record, not by the number.
+// Numbers may repeat in a function of more labels than that; references are told by the record, not by the number.
 int32_t fresh_internal_label() {
     int32_t& counter = currfuninfo->label_counters[internal_label_index];
     counter = counter <= LOWEST_INTERNAL_LABEL ? -1 : counter - 1;
@@ -246,8 +246,8 @@ bool numbers_still_hold() {
     return in_order && currfuninfo->bb_count == n;
 }
 
-const FACT_FINDER numbers("block numbers", fact::block_numbers, fact::none, [](FACTS) { renumber_bblocks(); }, nullptr,
-                          numbers_still_hold);
+const FACT_FINDER numbers(
+    "block numbers", fact::block_numbers, fact::none, [](FACTS) { renumber_bblocks(); }, nullptr, numbers_still_hold);
 
 } // namespace
 

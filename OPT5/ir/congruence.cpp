@@ -83,7 +83,7 @@ bool is_integer_chain(const NODE* t) {
 struct chain {
     const NODE* operand[MAX_CHAIN];
     int count = 0;
-    int operators = 0; // counted on the way down, so that a long chain is given up before its end
+    int operators = 0; // counted ahead of the operands, so that a long chain is given up before its end
     bool fits = true;
 };
 

@@ -74,7 +74,8 @@ EDGE* sort_edge_list(EDGE* list) {
 EDGE* fast_sort_edge_list(EDGE* list) {
     std::vector<EDGE*> cells;
     for (; list; list = list->rest) cells.push_back(list);
-    std::stable_sort(cells.begin(), cells.end(), [](const EDGE* a, const EDGE* b) { return a->first->dfn < b->first->dfn; });
+    std::stable_sort(cells.begin(), cells.end(),
+                     [](const EDGE* a, const EDGE* b) { return a->first->dfn < b->first->dfn; });
     EDGE* sorted = nullptr;
     for (auto it = cells.rbegin(); it != cells.rend(); ++it) {
         (*it)->rest = sorted;
@@ -218,7 +219,7 @@ BBLK* make_block_on_edge(BBLK* a, BBLK* b) {
     return n;
 }
 
-// An edge that need not be split unless every critical edge has to go: a forward edge outside loops, and the back edge
+// An edge that need not be split unless every critical edge must be: a forward edge outside loops, and the back edge
 // of a loop.
 bool edge_may_stay(const BBLK* a, const BBLK* b) {
     if (!a->loop) return a->dfn < b->dfn;
@@ -255,5 +256,6 @@ void split_critical_edges(bool all) {
 
 bool bb_is_split_critical_edge(const BBLK* bb) {
     if (edge_length(bb->predecessors) != 1 || edge_length(bb->successors) != 1) return false;
-    return edge_length(bb->predecessors->first->successors) >= 2 && edge_length(bb->successors->first->predecessors) >= 2;
+    return edge_length(bb->predecessors->first->successors) >= 2 &&
+           edge_length(bb->successors->first->predecessors) >= 2;
 }

@@ -1,9 +1,9 @@
 // What is known of the current function, and whether it is true now.
 //
-// A pass asks for what it relies on with `need`, which finds what is not known, and says with `changed` what its work left
-// true; everything else is forgotten. Between the two a pass keeps its own books: it may change statements under a fact
-// that it goes on using, as long as it knows what that does to the fact. An edit of blocks or edges ends what rests on
-// the graph at once.
+// A pass asks for what it relies on with `need`, which finds what is not known, and says with `changed` what its work
+// left true; everything else is forgotten. Between the two a pass keeps its own books: it may change statements under a
+// fact that it keeps using, as long as it knows what that does to the fact. An edit of blocks or edges ends what
+// rests on the graph at once.
 //
 // A room that can find a fact defines a FACT_FINDER beside the code that finds it.
 #pragma once
@@ -34,7 +34,7 @@ struct FACT_FINDER {
     FACTS rests_on;      // needed first; where one of these is forgotten, so is what rests on it
     FACTS on_the_way;    // what the same walk finds beside it where that is wanted too
     void (*find)(FACTS); // the fact and what of `on_the_way` is given, for the current function
-    void (*forget)();        // gives back what the fact holds in memory; may be null
+    void (*forget)();    // gives back what the fact holds in memory; may be null
     // For validation: finds it anew and compares; on return the fact is as it was or found anew. True if what was known
     // is still so. May be null.
     bool (*still_holds)();
@@ -48,12 +48,13 @@ struct FACT_FINDER {
 // All facts of `wanted` are true of the current function afterwards. A fact that no linked room finds is an assertion
 // failure.
 void need(FACTS wanted);
-// The current function was changed; of what was known `stays` is still true. A fact goes with what it rests on.
+// The current function was changed; of what was known `stays` is still true. A fact ends with what it rests on.
 void changed(FACTS stays);
 bool is_known(FACTS facts); // all of them, of the current function
 // For the edits of the graph: blocks came or went, or edges alone did. Of the facts that rest on the graph only its own
 // are forgotten: an edit in the middle of a pass does not take from it what it works with.
 void graph_was_changed(FUNINFO* f);
 void edges_were_changed(FUNINFO* f); // blocks keep their numbers
-// Finds every known fact anew and reports to the debug stream, or stderr without one, which ones were no longer true; their number.
+// Finds every known fact anew and reports to the debug stream, or stderr without one, which ones were no longer true;
+// their number.
 int validate_facts();

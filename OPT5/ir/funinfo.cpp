@@ -5,8 +5,8 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
-#include "OPT5/ir/loops.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "UTIL/abort.h"
@@ -103,7 +103,8 @@ FUNINFO* create_funinfo(const char* name, SYMTAB* sym, int known_system) {
     f->symbol = sym;
     f->uid = ++uid_counter;
     constexpr int VECTORIZE_ON = 50;
-    f->simd_allowed = pass_debug_SIMD || (file_options && file_options->getnumarg(option_obj::OO_vectorize) == VECTORIZE_ON);
+    f->simd_allowed =
+        pass_debug_SIMD || (file_options && file_options->getnumarg(option_obj::OO_vectorize) == VECTORIZE_ON);
     init_FUNINFO_flags(f, known_system);
     fileinfo.FUNLIST.push_back(f);
     funinfo_by_name.emplace(skip_name_prefix(name), f);
@@ -146,7 +147,7 @@ FUNINFO* make_FUNINFO(SYMTAB* sym) {
     if (f && !f->symbol && f != fileinfo.dummy) {
         f->symbol = sym;
         f->name = sym->name;
-        // What the name alone promised does not hold for a function that the program defines.
+        // What the name alone guaranteed does not hold for a function that the program defines.
         if (is_defined_here(sym) && TEST_FLAG(f, FUN_is_SYSTEM)) {
             clear_flags(f, ~uint64_t(FUN_is_main | FUN_is_cg_root | FUN_is_cpp));
         }
@@ -181,7 +182,8 @@ void unsuppress_inline_function(FUNINFO* f) {
     }
     if (write_opt_info) {
         info_printf("\nInlineable function %s() was marked for suppression,", f->name.c_str());
-        info_printf("\nbut it cannot be because of a problematic use in %s().\n\n", currfuninfo ? currfuninfo->name.c_str() : "");
+        info_printf("\nbut it cannot be because of a problematic use in %s().\n\n",
+                    currfuninfo ? currfuninfo->name.c_str() : "");
     }
     clear_flags(f, FUN_is_suppressed);
     if (TEST_FLAG(f, FUN_is_unsuppressed)) return;
@@ -199,7 +201,8 @@ struct FLAG_NAME {
     uint64_t bit;
     const char* name;
 };
-#define FLAG(f) {f, #f}
+#define FLAG(f)                                                                                                        \
+    { f, #f }
 constexpr FLAG_NAME flag_names[] = {
     FLAG(FUN_calls_anonymous), FLAG(FUN_cannot_suppress), FLAG(FUN_is_unsuppressed), FLAG(FUN_never_returns),
     FLAG(FUN_calls_OUTSIDE),   FLAG(FUN_cannot_inline),   FLAG(FUN_is_suppressed),   FLAG(FUN_no_global_asg),
@@ -214,8 +217,7 @@ constexpr FLAG_NAME flag_names[] = {
 
 void dump_funinfo_to(FILE* out, FUNINFO* f) {
     std::fprintf(out, "\nFunction %s()\n", f->name.c_str());
-    if (f->size)
-        std::fprintf(out, "Its integrable body size is %u units\n", f->size);
+    if (f->size) std::fprintf(out, "Its integrable body size is %u units\n", f->size);
     std::fprintf(out, "called from %d sites\n", f->ncallers);
     const uint64_t flags = get_flags(f);
     std::fprintf(out, "It has these properties: 0x%08lx\n", static_cast<unsigned long>(flags));

@@ -3,7 +3,7 @@
 // A back edge leads to a block that dominates its source; the loop of a header is what reaches a back edge to it
 // without passing the header. Cycles that are entered in two places are no loops here.
 //
-// `fact::loops` keeps them in FUNINFO::loops. A pass that splits edges in the middle of its work goes on with the record
+// `fact::loops` keeps them in FUNINFO::loops. A pass that splits edges in the middle of its work keeps using the record
 // that it holds: the block that `preheader` makes is entered in it.
 #pragma once
 

@@ -1,5 +1,6 @@
-// NODE: the tree node. One record serves every expression and statement kind. There are millions of them, and most walks
-// wait for memory: what few nodes need is kept in a record of its own, which a node gets when something is put there.
+// NODE: the tree node. One record serves every expression and statement kind. There are millions of them, and most
+// walks wait for memory: what few nodes need is kept in a record of its own, which a node gets when something is put
+// there.
 //
 // A subtree has one parent. Trees are owned by the place that holds them. A node lives from `new_node` to `erase_node`,
 // which sets `op` to ILLOP and frees it, so that a walker of an erased tree stops rather than misreads.
@@ -26,11 +27,11 @@ constexpr uint32_t NO_PROFILE = 0xFFFFFFFF;
 
 // A label. Owned by the block that it starts once the graph is built, by `label_mapping` of the reader before.
 struct LBL {
-    LBL* next = nullptr;       // next label of the same block
-    NODE* tree = nullptr;      // its definition, while that stands in a statement
-    BBLK* bblock = nullptr;    // the block that it starts
-    int32_t index = 0;         // label number; internal labels count down from -1
-    uint32_t refcount = 0;     // LABELREFs that name it
+    LBL* next = nullptr;    // next label of the same block
+    NODE* tree = nullptr;   // its definition, while that stands in a statement
+    BBLK* bblock = nullptr; // the block that it starts
+    int32_t index = 0;      // label number; internal labels count down from -1
+    uint32_t refcount = 0;  // LABELREFs that name it
 };
 
 // Links a node with dependence data to its node of the dependence graph.
@@ -62,16 +63,17 @@ public:
     NODE* left = nullptr;
     NODE* right = nullptr;
     union U {
-        INT65 lval; // ICON, LCON value; SCON length; LABELREF index; SKIP, SWITCH counts; CALL extra arguments; ASM kind
+        INT65
+            lval; // ICON, LCON value; SCON length; LABELREF index; SKIP, SWITCH counts; CALL extra arguments; ASM kind
         struct {
             uint64_t pad;
             union {
                 void* rval;
-                SYMTAB* sym;       // NAME
-                simul_fval* fval;  // FCON, owned
-                TYPE* csu;         // FIELD
-                char* name;        // ICALL, UICALL, MCALL, UMCALL, owned
-                SSAVAR* ssa;       // SSA operators
+                SYMTAB* sym;      // NAME
+                simul_fval* fval; // FCON, owned
+                TYPE* csu;        // FIELD
+                char* name;       // ICALL, UICALL, MCALL, UMCALL, owned
+                SSAVAR* ssa;      // SSA operators
             };
         };
         U() : lval() {}
@@ -171,5 +173,5 @@ void free_node(NODE* t);
 
 // A node with operands. SCONV, PCONV and ACONV take the type without its qualifiers.
 NODE* maketree(int op, NODE* left, NODE* right, TYPE* type, LS* ls = nullptr);
-// The same; `sym` goes to u.rval if it is not null, `lval` to u.lval otherwise.
+// The same; u.rval is `sym` if that is not null, otherwise u.lval is `lval`.
 NODE* mktree(int op, NODE* left, NODE* right, TYPE* type, SYMTAB* sym, INT65 lval);

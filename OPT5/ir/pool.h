@@ -1,8 +1,8 @@
 // Free-list memory for the records that trees and statement lists are made of.
 //
-// Nodes come and go by the million, and a pass frees about as many as it makes. A cell is taken from and given back to
-// a list of the thread at hand; only the refill and the end of a thread take a lock. Memory stays with the process.
-// Under the address sanitizer every record is its own allocation, so that a use after `erase_node` is caught.
+// Nodes are made and freed by the million, and a pass frees about as many as it makes. A cell is taken from and given
+// back to a list of the thread at hand; only the refill and the end of a thread take a lock. Memory stays with the
+// process. Under the address sanitizer every record is its own allocation, so that a use after `erase_node` is caught.
 #pragma once
 
 #include <cstddef>
@@ -40,8 +40,8 @@ private:
     static constexpr std::size_t CELLS_A_BLOCK = 512;
     static_assert(Size >= sizeof(cell) && Size % alignof(cell) == 0);
 
-    // Gives the cells of an ending thread to the others. `tail` is the last cell of the thread's list: the one that came
-    // when the list was empty, since cells come and go at the head.
+    // Gives the cells of an ending thread to the others. `tail` is the last cell of the thread's list: the one that
+    // came when the list was empty, since cells are taken and given back at the head.
     struct leaver {
         ~leaver() {
             if (!head) return;

@@ -122,7 +122,8 @@ void copy_to_predecessors() {
 
 // ---- Frequencies
 
-// The fixed point of "what comes in goes out by the probabilities", from the entry on; loops need more than one pass.
+// The fixed point of "what enters a block leaves it by its probabilities", from the entry on; loops need more than one
+// pass.
 void propagate_frequencies(double entry) {
     FUNINFO* f = currfuninfo;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) bb->dFreqIn = bb->dFreqOut = 0;

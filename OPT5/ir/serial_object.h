@@ -4,7 +4,7 @@
 #include <cstddef>
 #include <vector>
 
-// The manager's side: all objects by serial number; a slot is null once its object is gone.
+// The manager's side: all objects by serial number; the slot of an object that was destroyed is null.
 template <class T, class Manager>
 class serial_namespace {
 public:

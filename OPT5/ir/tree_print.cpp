@@ -1,7 +1,7 @@
 // Trees as text: the infix form that people read, and the dump of one line a node.
 //
 // The infix form is C as far as C has the operator: parentheses by precedence, casts as (type), control statements with
-// the labels that they go to. What C has no operator for is written as a call in the operator's name.
+// the labels that they branch to. What C has no operator for is written as a call in the operator's name.
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"

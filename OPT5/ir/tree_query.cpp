@@ -405,8 +405,9 @@ bool pointer_contains_adcon_term(const NODE* t) {
 }
 
 const NODE* pointer_behind_builtin(const NODE* t) {
-    if ((t->op != ICALL && t->op != MCALL) || !t->left || !type_ops_seams.builtin_points_into_operand_0) return nullptr;
-    if (!type_ops_seams.builtin_points_into_operand_0(t->u.name)) return nullptr;
+    if ((t->op != ICALL && t->op != MCALL) || !t->left || !type_ops_callbacks.builtin_points_into_operand_0)
+        return nullptr;
+    if (!type_ops_callbacks.builtin_points_into_operand_0(t->u.name)) return nullptr;
     return arg_list_lookup(t->left, 0);
 }
 

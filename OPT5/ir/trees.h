@@ -60,7 +60,8 @@ bool tree_lists_are_congruent(const LIST* a, const LIST* b);
 bool expr_is_constant(const NODE* t);
 bool expr_is_globally_evaluable(const NODE* t);
 bool tree_is_ASM_comment(const NODE* t);
-// The call that stands for the dispatch of an exception, and the SWITCH on it, which follows a statement that may throw.
+// The call that stands for the dispatch of an exception, and the SWITCH on it, which follows a statement that may
+// throw.
 constexpr char MAGIC_EH_NAME[] = "eh$dispatch";
 bool is_magic_EH_MCALL(const NODE* t);
 bool tree_is_EH_SWITCH(const NODE* t); // `t` may be null
@@ -123,7 +124,7 @@ struct PTENV_HOOKS {
 };
 extern PTENV_HOOKS ptenv_hooks;
 
-// ---- Erasing. A node erased twice is an internal error. LABELREFs are not discounted: their labels may be gone by
+// ---- Erasing. A node erased twice is an internal error. LABELREFs are not discounted: their labels may be freed by
 // then.
 void erase_tree(NODE* t);
 void erase_node(NODE* t);              // one node with what it owns, not its operands

@@ -11,7 +11,7 @@
 
 uint32_t max_scalar_alignment;
 uint64_t max_scalar_stride, pointer_type_stride;
-TYPE_OPS_SEAMS type_ops_seams;
+TYPE_OPS_CALLBACKS type_ops_callbacks;
 
 namespace {
 
@@ -199,7 +199,7 @@ TYPE* operator_type_for_operand_types(int op, TYPE* a, TYPE* b, TYPE* c, const c
     case UICALL:
     case MCALL:
     case UMCALL: // null where the name is unknown: the node keeps the type that it has
-        return type_ops_seams.builtin_return_type ? type_ops_seams.builtin_return_type(name) : c;
+        return type_ops_callbacks.builtin_return_type ? type_ops_callbacks.builtin_return_type(name) : c;
     case PCOMMA:
     case URETURN:
     case PPRAGMA:

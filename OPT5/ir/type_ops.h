@@ -9,14 +9,14 @@
 
 #include <vector>
 
-
 extern uint32_t max_scalar_alignment; // bits
 extern uint64_t max_scalar_stride, pointer_type_stride;
 
 void init_types(); // once, after the type package and the target's sizes are known
 uint64_t type_stride(const TYPE* t);
 TYPE* normalized_underlying_type(TYPE* t);
-// The node's type as the optimizer keeps it: normalized, an enumeration as its underlying type with the same qualifiers.
+// The node's type as the optimizer keeps it: normalized, an enumeration as its underlying type with the same
+// qualifiers.
 TYPE* normalized_value_type(TYPE* t);
 TYPE* promoted_type(TYPE* t);
 TYPE* combined_type_for_types(TYPE* a, TYPE* b);
@@ -55,14 +55,16 @@ bool type_could_be_an_array(TYPE* t);
 TYPE* type_of_nth_parameter(int n, const SYMTAB* sym); // null beyond the prototype
 void type_cache_stats();
 
-// Callbacks for what rooms above this one know. Each is null until the room installs it; null gives the conservative answer.
-struct TYPE_OPS_SEAMS {
+// Callbacks for what rooms above this one know. Each is null until the room installs it; null gives the conservative
+// answer.
+struct TYPE_OPS_CALLBACKS {
     TYPE* (*builtin_return_type)(const char* name) = nullptr;
     bool (*builtin_returns_1_or_0)(const char* name) = nullptr;
     NODE* (*fix_BIF_types)(NODE* call) = nullptr;
     INT65 (*find_known_zeros)(const NODE* tree, TYPE* type) = nullptr;
     bool (*calculate_bounds)(const NODE* tree, struct LOOP* loop, INT65* min, INT65* max) = nullptr;
-    bool (*builtin_points_into_operand_0)(const char* name) = nullptr; // its value is that pointer, or a place behind it
+    bool (*builtin_points_into_operand_0)(const char* name) =
+        nullptr; // its value is that pointer, or a place behind it
     bool (*constant_divides_expr)(INT65 constant, const NODE* tree) = nullptr;
 };
-extern TYPE_OPS_SEAMS type_ops_seams;
+extern TYPE_OPS_CALLBACKS type_ops_callbacks;

@@ -254,7 +254,7 @@ void make_compound(NODE* t) {
     erase_tree(rhs);
 }
 
-// The value stored is converted to the type of the place either way; the cast says so, except between pointers.
+// The value stored is converted to the type of the place in both cases; the cast says so, except between pointers.
 void coerce_stored_value(NODE* t) {
     TYPE *to = t->left->type->stqs(), *from = t->right->type;
     if (!to->is_scalar() || !from->is_scalar() || (to->is_pointer() && from->is_pointer()) || equiv_mtypes(to, from))
@@ -319,7 +319,7 @@ NODE* fix_value(NODE* t) {
     case ICALL:
     case UICALL:
     case MCALL:
-    case UMCALL: fix_operands(t); return type_ops_seams.fix_BIF_types ? type_ops_seams.fix_BIF_types(t) : t;
+    case UMCALL: fix_operands(t); return type_ops_callbacks.fix_BIF_types ? type_ops_callbacks.fix_BIF_types(t) : t;
     }
     if (op_is_int_compare(t->op) || op_is_float_compare(t->op)) return fix_comparison(t);
     if (opcode_is_ASG(t->op)) return fix_compound(t);
@@ -342,14 +342,14 @@ NODE* insert_mandatory_casts(NODE* tree) {
     return tree;
 }
 
-// A cast that was moved under a sum goes back above it; the sum gets the type of its own pointer again.
+// A cast that was moved under a sum is put back above it; the sum gets the type of its own pointer again.
 NODE* remove_pushed_down_casts(NODE* tree) {
     if (!tree) return tree;
     TYPE* old = tree->type;
     tree->left = remove_pushed_down_casts(tree->left);
     tree->right = remove_pushed_down_casts(tree->right);
-    if ((tree->op == ICALL || tree->op == MCALL) && type_ops_seams.fix_BIF_types)
-        return type_ops_seams.fix_BIF_types(tree);
+    if ((tree->op == ICALL || tree->op == MCALL) && type_ops_callbacks.fix_BIF_types)
+        return type_ops_callbacks.fix_BIF_types(tree);
     if ((tree->op != PLUS && tree->op != MINUS) || !tree->type->is_pointer()) return tree;
     while ((tree->left->op == PCONV || tree->left->op == ISP2CHAR) && tree->left->left->type->is_pointer()) {
         NODE* cast = tree->left;

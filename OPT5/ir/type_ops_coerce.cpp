@@ -107,8 +107,8 @@ NODE* push_down_pointer_cast(TYPE* t, NODE* tree) {
     bool is_sum =
         (tree->op == PLUS || tree->op == MINUS) && tree->left->type->is_pointer() && is_integral(tree->right->type);
     INT65 element(t->type_pointed_to()->size_in_bytes());
-    if (!is_sum || element.is_zero() || !type_ops_seams.constant_divides_expr ||
-        !type_ops_seams.constant_divides_expr(element, tree->right))
+    if (!is_sum || element.is_zero() || !type_ops_callbacks.constant_divides_expr ||
+        !type_ops_callbacks.constant_divides_expr(element, tree->right))
         return coerce_to_type(t, tree);
     tree->left = push_down_pointer_cast(t, tree->left);
     tree->type = tree->left->type;

@@ -26,9 +26,9 @@ static bool operand_of_ABS_returns_1_or_0(const NODE* t, int* budget) {
 
 static bool known_bits_are_one_bit(const NODE* t) {
     TYPE* type = element_type(t->type);
-    if (!type_ops_seams.find_known_zeros || t->type->is_vector()) return false;
+    if (!type_ops_callbacks.find_known_zeros || t->type->is_vector()) return false;
     INT65 above = type_mask(type) & ~INT65(1);
-    return (above & ~type_ops_seams.find_known_zeros(t, type)).is_zero();
+    return (above & ~type_ops_callbacks.find_known_zeros(t, type)).is_zero();
 }
 
 static bool returns_1_or_0(const NODE* t, int* budget) {
@@ -83,7 +83,8 @@ static bool returns_1_or_0(const NODE* t, int* budget) {
     case ICALL:
     case MCALL:
     case UICALL:
-        if (type_ops_seams.builtin_returns_1_or_0 && type_ops_seams.builtin_returns_1_or_0(t->u.name)) return true;
+        if (type_ops_callbacks.builtin_returns_1_or_0 && type_ops_callbacks.builtin_returns_1_or_0(t->u.name))
+            return true;
         break;
     default:
         if (boolean_result[t->op] && !t->type->is_vector()) return true;
@@ -114,7 +115,8 @@ bool value_fits_in_type(const NODE* tree, TYPE* t, struct LOOP* loop) {
     INT65 min = int_type_min(own), max = int_type_max(own), known_min, known_max;
     if (tree->op == ICON)
         min = max = tree->u.lval;
-    else if (type_ops_seams.calculate_bounds && type_ops_seams.calculate_bounds(tree, loop, &known_min, &known_max)) {
+    else if (type_ops_callbacks.calculate_bounds &&
+             type_ops_callbacks.calculate_bounds(tree, loop, &known_min, &known_max)) {
         min = known_min;
         max = known_max;
     }

@@ -24,8 +24,8 @@ int live_index(const SYMTAB* sym);
 
 // ---- Dead assignments
 // Removes assignments whose value no path reads, takes assignments out of expressions, and delays those that only one
-// successor of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments were removed.
-// With `early` the graph is left to the caller to simplify.
+// successor of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments were
+// removed. With `early` the graph is left to the caller to simplify.
 int elim_dead_assigns(bool keep_embedded, bool early);
 // In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads go.
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop);
@@ -36,8 +36,8 @@ bool combine_assignments(LIST* cell);
 // A destructor need not store to members that no later statement reads.
 void remove_unneeded_stores_from_destructor();
 
-// Puts the assignment in front of a test into it, where the test compares the variable with a constant: the value need not be
-// read again. Needs the bits of the candidates.
+// Puts the assignment in front of a test into it, where the test compares the variable with a constant: the value need
+// not be read again. Needs the bits of the candidates.
 void prop_asg_into_if(BBLK* bb);
 // The same in every block, ahead of register allocation; also counts the loops around each block, in BBLK::depth. Needs
 // `fact::live_variables`.

@@ -6,9 +6,9 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
-#include "OPT5/ir/loops.h"
 #include "OPT5/target/target.h"
 
 namespace {

@@ -1,8 +1,8 @@
 // Assignments.
 //
-// A value is stored as the place has it: casts and masks that only do the same again are gone. An assignment that reads
-// its own target first becomes a compound one, but for counters of local variables, which stay sums; a compound one
-// that changes nothing, or leaves a constant, becomes what it is.
+// A value is stored as the place has it: casts and masks that only do the same again are removed. An assignment that
+// reads its own target first becomes a compound one, but for counters of local variables, which stay sums; a compound
+// one that changes nothing, or leaves a constant, becomes what it is.
 
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -51,7 +51,7 @@ bool cast_is_idle(const NODE* lhs, const NODE* cast) {
     if (to->is_float() && by->is_float() && from->is_float()) return by->size == to->size || from->size <= by->size;
     if (!is_integer(to) || !is_integer(by) || !is_integer(from)) return false;
     if (by->size >= to->size) return true;
-    return by->size > from->size && !(is_signed(from) && !is_signed(by)); // only widens on the way
+    return by->size > from->size && !(is_signed(from) && !is_signed(by)); // widens in between, no more
 }
 
 void drop_idle_operators(NODE* t) {

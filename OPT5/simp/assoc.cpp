@@ -2,7 +2,7 @@
 //
 // A sum becomes terms with factors, one a value, and one constant; a product its operands and one constant; chains of
 // bit operators lose operands that meet themselves. A chain that nothing meets in stays as it is. The new order gives
-// other numbers on the way, and what may overflow there computes unsigned.
+// other numbers in between, and what may overflow there computes unsigned.
 
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"

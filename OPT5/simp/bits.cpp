@@ -27,7 +27,7 @@ NODE* join_constants(NODE* t, struct LOOP* loop) {
         t->left = take_left(inner);
         return simp_node(t, loop);
     }
-    std::swap(t->right, inner->right); // (x op c) op y: the constant goes outward
+    std::swap(t->right, inner->right); // (x op c) op y: the constant moves outward
     t->left = simp_node(inner, loop);
     return simp_node(t, loop);
 }

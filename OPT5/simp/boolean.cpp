@@ -1,7 +1,7 @@
 // Trees as truth values.
 //
 // A condition is in control form: it is zero where it does not hold and anything else where it does; compares with
-// zero, widening casts and shifts of a single bit that say nothing more are gone.
+// zero, widening casts and shifts of a single bit that say nothing more are removed.
 
 #include "OPT5/ir/global.h"
 #include "OPT5/simp/algebra.h"
@@ -213,7 +213,7 @@ NODE* simp_for_control(NODE* t, struct LOOP* loop) {
     t = without_idle_layers(t);
     for (RULE rule : control_rules)
         if (NODE* r = rule(t, loop)) return r;
-    // A chain was simplified as it was built; to go down it again from each of its nodes would be quadratic.
+    // A chain was simplified as it was built; to walk it again from each of its nodes would be quadratic.
     const bool is_chain = t->op == OROR || t->op == ANDAND || t->op == QUEST || t->op == COMMAOP;
     return is_chain ? t : simp_node(t, loop);
 }

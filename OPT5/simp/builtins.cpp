@@ -155,7 +155,8 @@ NODE* unaligned_rest(const NODE* p, INT65 alignment) {
         if (p->op == PCONV && p->left->type->is_pointer()) {
             p = p->left;
         } else if ((p->op == PLUS || p->op == MINUS) && p->left->type->is_pointer() &&
-                   type_ops_seams.constant_divides_expr && type_ops_seams.constant_divides_expr(alignment, p->right)) {
+                   type_ops_callbacks.constant_divides_expr &&
+                   type_ops_callbacks.constant_divides_expr(alignment, p->right)) {
             p = p->left;
         } else {
             return copy_tree(p);

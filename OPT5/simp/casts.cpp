@@ -1,4 +1,4 @@
-// Casts: one that changes nothing is gone, of two only the outer one counts where the inner loses nothing that it
+// Casts: one that changes nothing is removed, of two only the outer one counts where the inner loses nothing that it
 // keeps, and what a narrower type drops is not computed.
 
 #include "OPT5/simp/algebra.h"
@@ -26,7 +26,7 @@ NODE* integer_cast_of_cast(NODE* t, struct LOOP* loop) {
     TYPE *to = t->type, *middle = inner->type, *from = inner->left->type;
     bool superfluous;
     if (to->is_bool())
-        superfluous = !middle->is_bool() && middle->size >= from->size; // nothing is lost on the way
+        superfluous = !middle->is_bool() && middle->size >= from->size; // the middle type loses nothing
     else if (middle->is_bool())
         superfluous = false;
     else
@@ -68,7 +68,7 @@ NODE* compute_narrow(NODE* t, struct LOOP* loop) {
     return coerced(type, simp_node(inner, loop), loop);
 }
 
-// Between numbers and floating point: casts on the way that lose nothing.
+// Between numbers and floating point: casts in between that lose nothing.
 NODE* floating_cast_of_cast(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     if (inner->op != SCONV || is_bitfield_access(inner->left) || inner->left->type->is_bool()) return nullptr;

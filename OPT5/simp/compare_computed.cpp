@@ -2,7 +2,7 @@
 //
 // What such a value is compared with says which operands it comes from: an interval for a quotient and a right shift,
 // the low bits and the sign for a remainder of a power of two, one number for a product with an odd factor, which
-// takes each value once as it wraps. The operator itself is gone.
+// takes each value once as it wraps. The operator itself is removed.
 
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/compare.h"

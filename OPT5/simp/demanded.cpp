@@ -40,7 +40,7 @@ public:
     }
 
 private:
-    // A carry only goes upward.
+    // A carry only moves upward.
     static uint64_t up_to_highest(uint64_t mask) {
         for (int s = 1; s < 64; s *= 2) mask |= mask >> s;
         return mask;

@@ -1,12 +1,12 @@
 // Signed arithmetic that stays exact. For every pass that builds trees.
 //
 // The rule: a signed sum, difference, product or negation of a tree never leaves its type where no operation of the
-// tree that came in did. Values wrap either way, but the passes conclude from signed arithmetic that a result is the
-// number itself: signs of variables, addresses as sums, factors. The language promises that of the program as it was
+// tree that came in did. Values wrap in both, but the passes conclude from signed arithmetic that a result is the
+// number itself: signs of variables, addresses as sums, factors. The language guarantees that of the program as it was
 // written, and of nothing that a rewrite makes up.
 //
 // A rewrite whose operator gives the very number that the former one gave, over operands that are exact, keeps the rule
-// by itself: (x + 1) + 2 as x + 3. One that computes another number on the way does not: of (x + 1) + y the sum x + y
+// by itself: (x + 1) + 2 as x + 3. One that computes another number in between does not: of (x + 1) + y the sum x + y
 // may overflow. It must show by the bounds of the operands that nothing does, or compute in the unsigned type, whose
 // bits are the same, or leave the tree as it is.
 //

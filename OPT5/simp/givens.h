@@ -35,7 +35,8 @@ void for_each_given(struct LOOP* loop, VISIT&& visit) {
         for (const NODE* fact : facts)
             if (left-- > 0) visit_given(fact, true, MOST_FACT_LEVELS, visit);
     };
-    if (loop_seams.givens)
-        for (; loop; loop = loop_seams.parent ? loop_seams.parent(loop) : nullptr) visit_all(loop_seams.givens(loop));
+    if (loop_callbacks.givens)
+        for (; loop; loop = loop_callbacks.parent ? loop_callbacks.parent(loop) : nullptr)
+            visit_all(loop_callbacks.givens(loop));
     if (currfuninfo) visit_all(currfuninfo->givens);
 }

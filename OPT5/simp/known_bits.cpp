@@ -1,5 +1,5 @@
 // Known bits. Each rule takes the masks of the operands to the masks of the result; a value that an operator changes by
-// a conversion of its operand goes through that conversion first, so that widths and signs are the target's.
+// a conversion of its operand is converted first, so that widths and signs are the target's.
 
 #include "OPT5/simp/known_bits.h"
 

@@ -50,7 +50,7 @@ NODE* multiply_by_small_constant(NODE* t, struct LOOP* loop) {
     return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
 }
 
-// -x * c: the sign goes to the constant. -x * -y: none is left.
+// -x * c: the constant takes the sign. -x * -y: none is left.
 NODE* multiply_negation(NODE* t, struct LOOP* loop) {
     const bool left = is_unary(t->left, UMINUS), right = is_unary(t->right, UMINUS);
     if (!left && !right) return nullptr;
@@ -234,7 +234,7 @@ NODE* divide_trivially(NODE* t, struct LOOP* loop) {
     return nullptr;
 }
 
-// The sign goes outside: a division truncates toward zero whatever the signs.
+// The sign moves outside: a division truncates toward zero whatever the signs.
 NODE* divide_negations(NODE* t, struct LOOP* loop) {
     if (t->type->is_unsigned()) return nullptr;
     NODE *l = t->left, *r = t->right;

@@ -1,7 +1,7 @@
 // Questions about shapes, and replacements, that the rules of the simplifier share.
 
-#include "OPT5/ir/walks.h"
 #include "OPT5/simp/rule.h"
+#include "OPT5/ir/walks.h"
 
 #include "OPT5/simp/simp.h"
 
@@ -61,7 +61,7 @@ NODE* made(int op, NODE* left, NODE* right, TYPE* type, struct LOOP* loop) {
 NODE* coerced(TYPE* type, NODE* t, struct LOOP* loop) {
     auto is_cast = [](const NODE* n) { return n->op == SCONV || n->op == PCONV; };
     NODE* r = coerce_to_type(type, t);
-    if (r->op == QUEST && r->right->op == COLON) { // the cast may have gone into the arms
+    if (r->op == QUEST && r->right->op == COLON) { // the cast may stand in the arms now
         bool any = false;
         for (NODE** arm : {&r->right->left, &r->right->right})
             if (is_cast(*arm)) {

@@ -1,5 +1,5 @@
-// What the rules of the simplifier are written in: small questions about shapes, and the ways to put one node in the
-// place of another. For the sources of this room.
+// What the rules of the simplifier are written in: small questions about shapes, and the functions that put one node in
+// the place of another. For the sources of this room.
 //
 // A rule owns the node that it is given, whose operands are simplified, and returns what stands for it. Operands that a
 // rule drops keep their effects; operands change places only where neither order of evaluation shows.

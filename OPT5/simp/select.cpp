@@ -2,7 +2,7 @@
 //
 // Canonical forms: the condition of a QUEST is in control form, and not negated; arms that are truth values make it a
 // logical operator, arms of the same cast or sign have it outside; the test of a minimum or maximum is LT or GT of the
-// arms in their order. A cast that the operand's bits or the use of the result make idle is gone.
+// arms in their order. A cast that the operand's bits or the use of the result make idle is removed.
 
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"

@@ -1,9 +1,10 @@
 // Sequencing of raw trees into statements.
 //
-// The parser's statements hold control flow at their root: conditional branches that jump when their condition is false,
-// conditional expressions and logical operators used for effect, comma chains, increments. Each becomes plain statements,
-// IFs that name both targets, and labels, in the order in which the tree would have been evaluated. Control flow that
-// yields a value inside an expression stays where it is. A condition made of ANDAND, OROR and EXCLAIM becomes one IF a test.
+// The parser's statements hold control flow at their root: conditional branches that jump when their condition is
+// false, conditional expressions and logical operators used for effect, comma chains, increments. Each becomes plain
+// statements, IFs that name both targets, and labels, in the order in which the tree would have been evaluated. Control
+// flow that yields a value inside an expression stays where it is. A condition made of ANDAND, OROR and EXCLAIM becomes
+// one IF a test.
 
 #include "OPT5/simp/seq.h"
 
@@ -29,8 +30,8 @@ public:
         : out(statement_list), psn(position), is_simplified(simplified) {}
 
     void statement(NODE* t) {
-        const bool takes_apart = t->op == QUEST || t->op == ANDAND || t->op == OROR || t->op == COMMAOP || t->op == PLUSPLUS ||
-                                 t->op == MINMIN || t->op == CBRANCH;
+        const bool takes_apart = t->op == QUEST || t->op == ANDAND || t->op == OROR || t->op == COMMAOP ||
+                                 t->op == PLUSPLUS || t->op == MINMIN || t->op == CBRANCH;
         if (takes_apart) is_simplified = false;
         switch (t->op) {
         case QUEST: conditional(t); break;
@@ -49,10 +50,11 @@ public:
     }
 
 private:
-    // A branch right behind a conditional branch is where that one goes when its condition is true.
+    // A branch right behind a conditional branch is what that one reaches when its condition is true.
     bool joined_to_if(NODE* t) {
         LIST* label_cell = *out;
-        if (!label_cell || label_cell->first->op != LABELDEF || !label_cell->rest || label_cell->rest->first->op != IF) return false;
+        if (!label_cell || label_cell->first->op != LABELDEF || !label_cell->rest || label_cell->rest->first->op != IF)
+            return false;
         LBL* lbl = label_cell->first->lbl;
         NODE* targets = label_cell->rest->first->right;
         if (targets->left->lbl != lbl || lbl->refcount != 1 || lbl->index >= 0) return false;
@@ -162,7 +164,7 @@ private:
                !c->left->type->is_float() && !c->left->type->is_complex() && !c->left->type->is_pointer();
     }
 
-    // Tests `c` and goes to one of two places; consumes all three.
+    // Tests `c` and branches to one of two labels; consumes all three.
     void condition(NODE* c, NODE* if_true, NODE* if_false) {
         switch (c->op) {
         case EXCLAIM: {
@@ -250,7 +252,9 @@ void dispatch_behind(NODE* t, LIST** out, PSN* psn) {
 
 } // namespace
 
-void sequence_tree(NODE* tree, LIST** list, PSN* psn, bool simplified) { SEQUENCER(list, psn, simplified).statement(tree); }
+void sequence_tree(NODE* tree, LIST** list, PSN* psn, bool simplified) {
+    SEQUENCER(list, psn, simplified).statement(tree);
+}
 
 NODE* promote_tree(NODE* tree, LIST** list, PSN* psn) {
     while (tree->op == COMMAOP) {
@@ -309,8 +313,8 @@ NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through) {
             cases = cases ? maketree(COMMA, cases, entry, tp->int_t, scope) : entry;
         }
     NODE* dflt = maketree(DEFAULT, fall_through, nullptr, tp->int_t, scope);
-    NODE* sw = maketree(SWITCH, mk_MCALL(MAGIC_EH_NAME, nullptr, tp->int_t), maketree(COMMA, cases, dflt, tp->int_t, scope),
-                        tp->int_t, scope);
+    NODE* sw = maketree(SWITCH, mk_MCALL(MAGIC_EH_NAME, nullptr, tp->int_t),
+                        maketree(COMMA, cases, dflt, tp->int_t, scope), tp->int_t, scope);
     sw->u.lval = INT65(count);
     return sw;
 }

@@ -17,7 +17,7 @@ NODE* shift_by_nothing(NODE* t, struct LOOP*) {
     return nullptr;
 }
 
-// Two shifts the same way are one. Past the width, a signed right shift leaves copies of the sign, the others zero.
+// Two shifts in one direction are one. Past the width, a signed right shift leaves copies of the sign, the others zero.
 NODE* join_shifts(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     const int n = shift_count_of(t), m = inner->op == t->op ? shift_count_of(inner) : 0;

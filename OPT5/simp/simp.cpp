@@ -1,6 +1,6 @@
 // The dispatch of the simplifier: from the opcode to the rules that apply to it.
 //
-// What every node goes through first: its type is normalized, effects of its operands are taken in front of it,
+// What is done to every node first: its type is normalized, effects of its operands are taken in front of it,
 // constants are folded. Then the handler of its opcode. A tree is walked with a stack of its own, since sums,
 // conditionals and comma chains of generated programs are as deep as they are long.
 
@@ -85,7 +85,7 @@ bool may_follow(const NODE* before, const NODE* effects) {
 // Effects of the value that is assigned come before a variable is set, whatever its address is.
 bool left_is_plain_target(const NODE* t) { return opcode_is_ASG(t->op) && t->left->op == NAME; }
 
-// `(a, *p) = e`: the effects go back into the address, from where they do not move against the value.
+// `(a, *p) = e`: the effects are put back into the address, where their order against the value stays as it was.
 void put_effects_into_address(NODE* t) {
     NODE *comma = t->left, *place = comma->right;
     while (place->op == STDOT) place = place->left;
@@ -363,8 +363,8 @@ NODE* simp_tree(NODE* tree, struct LOOP* loop) {
 }
 
 void init_simplifier() {
-    type_ops_seams.find_known_zeros = find_known_zeros;
-    install_symbolic_seams();
+    type_ops_callbacks.find_known_zeros = find_known_zeros;
+    install_symbolic_callbacks();
     install_BIF_simplifiers();
 }
 

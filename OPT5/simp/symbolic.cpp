@@ -11,7 +11,7 @@
 
 #include <numeric>
 
-LOOP_SEAMS loop_seams;
+LOOP_CALLBACKS loop_callbacks;
 
 namespace {
 
@@ -137,12 +137,12 @@ bool expr_product_may_overflow(const NODE* tree, struct LOOP* loop) {
 
 // ---- Callbacks
 
-void install_symbolic_seams() {
-    type_ops_seams.calculate_bounds = calculate_bounds;
-    type_ops_seams.constant_divides_expr = [](INT65 constant, const NODE* tree) {
+void install_symbolic_callbacks() {
+    type_ops_callbacks.calculate_bounds = calculate_bounds;
+    type_ops_callbacks.constant_divides_expr = [](INT65 constant, const NODE* tree) {
         return constant_divides_expr(constant, tree->type, tree, nullptr);
     };
-    bif_seams.calculate_bounds = calculate_bounds;
+    bif_callbacks.calculate_bounds = calculate_bounds;
 }
 
 // ---- Helpers

@@ -22,7 +22,8 @@ struct LOOP;
 // ---- Bounds, both attained or not; the lower is never above the upper.
 INT65 calculate_minval_for_tree(const NODE* tree, struct LOOP* loop);
 INT65 calculate_maxval_for_tree(const NODE* tree, struct LOOP* loop);
-// Both at once; false, and nothing stored, for what is no integer. The form for `type_ops_seams` and `bif_seams`.
+// Both at once; false, and nothing stored, for what is no integer. The form for `type_ops_callbacks` and
+// `bif_callbacks`.
 bool calculate_bounds(const NODE* tree, struct LOOP* loop, INT65* min, INT65* max);
 
 // ---- Sign and zero
@@ -44,7 +45,7 @@ bool tree_values_are_not_equal(const NODE* a, const NODE* b, struct LOOP* loop);
 // ---- Factors
 // The largest constant that is known to divide the value: at least 1. A value that is zero for certain gives the
 // highest power of two in its type. With `no_signed_overflow` signed sums and products are taken to be exact, as the
-// language promises; without, an odd factor only stays where the bounds show that nothing wraps.
+// language guarantees; without, an odd factor only stays where the bounds show that nothing wraps.
 INT65 max_ICON_factor(const NODE* tree, struct LOOP* loop, bool no_signed_overflow = false);
 // The greatest common divisor of the constant coefficients of the tree's terms, from its shape alone: at least 1; 0
 // where every term is zero. What it divides is the tree as a formula: the value itself only if no operation wraps.
@@ -84,12 +85,12 @@ uint32_t uint_gcd(uint32_t a, uint32_t b);
 uint32_t uint_lcm(uint32_t a, uint32_t b);               // 0 if one is 0, or where it has no 32 bits
 int compare_SLLONG_values(INT65 a, INT65 b, TYPE* type); // -1, 0, 1: both as `type` holds them
 
-void install_symbolic_seams(); // once: other rooms' questions are answered here
+void install_symbolic_callbacks(); // once: other rooms' questions are answered here
 
 // What the questions ask of a loop, installed by the room that keeps loops; with null, a loop tells nothing.
-struct LOOP_SEAMS {
+struct LOOP_CALLBACKS {
     const std::vector<NODE*>& (*givens)(const struct LOOP* loop) = nullptr; // conditions that hold throughout the loop
     struct LOOP* (*parent)(const struct LOOP* loop) = nullptr;              // null of the outermost
     bool (*is_constant_in)(const NODE* tree, const struct LOOP* loop) = nullptr; // one value in all iterations
 };
-extern LOOP_SEAMS loop_seams;
+extern LOOP_CALLBACKS loop_callbacks;

@@ -117,7 +117,7 @@ bool compares_values(const NODE* t) {
 class WALK {
 public:
     explicit WALK(struct LOOP* in) : loop(in) {
-        uses_givens = (loop && loop_seams.givens) || (currfuninfo && !currfuninfo->givens.empty());
+        uses_givens = (loop && loop_callbacks.givens) || (currfuninfo && !currfuninfo->givens.empty());
     }
 
     RANGE of(const NODE* t) {

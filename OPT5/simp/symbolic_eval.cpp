@@ -32,7 +32,7 @@ public:
 private:
     bool varies(const NODE* t) const {
         if (t->op == ICON || !loop) return false;
-        return !loop_seams.is_constant_in || !loop_seams.is_constant_in(t, loop);
+        return !loop_callbacks.is_constant_in || !loop_callbacks.is_constant_in(t, loop);
     }
 
     NODE* bound(const NODE* t, bool up) const {

@@ -264,7 +264,7 @@ INT65 max_ICON_delta(const NODE* tree, struct LOOP* loop) {
     FACTOR f = 0;
     bool varies = false;
     for (const LINEAR_FORM::TERM& term : form.sum()) {
-        if (loop && loop_seams.is_constant_in && loop_seams.is_constant_in(term.tree, loop)) continue;
+        if (loop && loop_callbacks.is_constant_in && loop_callbacks.is_constant_in(term.tree, loop)) continue;
         varies = true;
         f = gcd(f, product(magnitude(WIDE(term.coefficient)), FACTORS(loop, false).of(term.tree)));
     }

@@ -16,7 +16,7 @@
 #include <memory>
 #include <vector>
 
-BIF_SEAMS bif_seams;
+BIF_CALLBACKS bif_callbacks;
 
 namespace {
 
@@ -356,10 +356,10 @@ void init_BIF_descriptors() {
     init_BIFs_for_target();
     for (auto& entry : descriptors)
         if (!entry.second->has(IS_GENERIC)) normalize_types(entry.second.get());
-    type_ops_seams.builtin_return_type = builtin_return_type;
-    type_ops_seams.builtin_returns_1_or_0 = builtin_returns_1_or_0;
-    type_ops_seams.builtin_points_into_operand_0 = builtin_points_into_operand_0;
-    type_ops_seams.fix_BIF_types = fix_BIF_types;
+    type_ops_callbacks.builtin_return_type = builtin_return_type;
+    type_ops_callbacks.builtin_returns_1_or_0 = builtin_returns_1_or_0;
+    type_ops_callbacks.builtin_points_into_operand_0 = builtin_points_into_operand_0;
+    type_ops_callbacks.fix_BIF_types = fix_BIF_types;
     dump_BIF_descriptors(true, false);
     dump_BIF_descriptors(false, true);
 }

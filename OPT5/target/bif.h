@@ -45,7 +45,7 @@ struct BIF {
     using SIMPLIFIER = NODE* (*)(NODE* call, struct LOOP* loop);
     using EVALUATOR = NODE* (*)(NODE* call);
 
-    BIF* partner = nullptr;             // generic entry and its instance, both ways
+    BIF* partner = nullptr;             // generic entry and its instance, each the partner of the other
     BIF* associative_partner = nullptr; // the other version of an associative pair
     TYPE* return_type = nullptr;
     NODE* parameters = nullptr; // NAMEs chained by COMMA, null for none
@@ -82,12 +82,12 @@ BIF* find_target_BIF_descriptor(const char* name); // of a generic entry its ins
 void dump_BIF_descriptors(bool generics, bool non_generics);
 
 // What the rule base declares of a call that has no descriptor; null while there is no rule base.
-struct BIF_SEAMS {
+struct BIF_CALLBACKS {
     bool (*declared_flags)(const NODE* call, uint32_t* flags) = nullptr;
     uint32_t (*unCSEable_operands)(const NODE* call) = nullptr; // 255 without a declaration
     bool (*calculate_bounds)(const NODE* tree, struct LOOP* loop, INT65* min, INT65* max) = nullptr;
 };
-extern BIF_SEAMS bif_seams;
+extern BIF_CALLBACKS bif_callbacks;
 
 // ---- Calls in trees
 // Coerces the arguments to the parameters' types, and the result from the return type to the type that the node had.

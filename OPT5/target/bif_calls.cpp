@@ -85,7 +85,7 @@ NODE* fix_BIF_types(NODE* call) {
     if (!bif) {
         if (find_BIF_descriptor(call->u.name)) return call; // the optimizer's own marks take any type
         uint32_t flags = 0;
-        bool declared = bif_seams.declared_flags && bif_seams.declared_flags(call, &flags);
+        bool declared = bif_callbacks.declared_flags && bif_callbacks.declared_flags(call, &flags);
         if (declared && (flags & (IS_PROPER_MINVAL | IS_PROPER_MAXVAL)))
             for_each_argument(&call->left, [call](NODE** arg) { *arg = coerce_to_type(call->type, *arg); });
         else
@@ -110,7 +110,7 @@ RANGE range_of_tree(const NODE* t, struct LOOP* loop) {
     if (t->op == ICON) return {t->u.lval, t->u.lval};
     RANGE r = range_of_type(t->type);
     INT65 min, max;
-    if (bif_seams.calculate_bounds && bif_seams.calculate_bounds(t, loop, &min, &max)) r = {min, max};
+    if (bif_callbacks.calculate_bounds && bif_callbacks.calculate_bounds(t, loop, &min, &max)) r = {min, max};
     return r;
 }
 
@@ -152,7 +152,7 @@ INT65 calculate_minval_for_BIF_call(const NODE* call, struct LOOP* loop) { retur
 static uint32_t flags_of_call(const NODE* call) {
     if (const BIF* bif = find_BIF_descriptor(call->u.name)) return bif->flags;
     uint32_t flags = 0;
-    if (bif_seams.declared_flags) bif_seams.declared_flags(call, &flags);
+    if (bif_callbacks.declared_flags) bif_callbacks.declared_flags(call, &flags);
     return flags;
 }
 
@@ -167,7 +167,7 @@ bool ok_to_CSE_ICALL_opds(const NODE* call) {
 }
 
 uint32_t find_unCSEable_opds(const NODE* call) {
-    return bif_seams.unCSEable_operands ? bif_seams.unCSEable_operands(call) : 255;
+    return bif_callbacks.unCSEable_operands ? bif_callbacks.unCSEable_operands(call) : 255;
 }
 
 // ---- Kinds of calls

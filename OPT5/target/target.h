@@ -40,11 +40,11 @@ INT65 loop_unrolling_factor(const LIST* statements, INT65 count);
 bool tree_is_OK_for_unrolling(const NODE* stmt);
 
 // What unrolling asks of the room that knows divisions; null until it is there, where none disappears.
-struct UNROLLING_SEAMS {
+struct UNROLLING_CALLBACKS {
     bool (*division_disappears)(const NODE* division) =
         nullptr; // it becomes other operators, which may all be unrolled
 };
-extern UNROLLING_SEAMS unrolling_seams;
+extern UNROLLING_CALLBACKS unrolling_callbacks;
 
 // ---- Hooks of a register allocator; nothing to do here
 void find_target_conflicts(NODE* t, BITVEC* live, BITVEC* conflicts, long index);

@@ -16,7 +16,7 @@
 #include <algorithm>
 #include <cstring>
 
-UNROLLING_SEAMS unrolling_seams;
+UNROLLING_CALLBACKS unrolling_callbacks;
 
 namespace {
 
@@ -48,7 +48,7 @@ bool node_is_OK_for_unrolling(const NODE* t) {
     case CALL:
     case UCALL: return false;
     case DIV:
-    case MOD: return unrolling_seams.division_disappears && unrolling_seams.division_disappears(t);
+    case MOD: return unrolling_callbacks.division_disappears && unrolling_callbacks.division_disappears(t);
     case ASM: return tree_is_ASM_comment(t);
     case ASG:
         if (t->type->is_vector() && t->left->op != NAME) return false;

@@ -1,4 +1,4 @@
-// Loads, stores and steps of variables, for each representation and each way to find the address.
+// Loads, stores and steps of variables, for each representation and each form of the address.
 #include "tools/exec/ops.h"
 
 namespace {

@@ -78,7 +78,7 @@ int64_t reversed(uint64_t v, unsigned bits) {
     for (unsigned i = 0; i < bits; i++) r |= (v >> i & 1) << (bits - 1 - i);
     return static_cast<int64_t>(r);
 }
-// Shifted left until the sign bit is the only one of its kind; the count goes where argument 1 points.
+// Shifted left until the sign bit is the only one of its kind; the count is stored where argument 1 points.
 int64_t normalized(A& a, unsigned bits) {
     int64_t v = wrap(a.i(0), bits, true), n = 0;
     if (v == 0)
@@ -105,8 +105,9 @@ int64_t rotated(uint64_t v, int64_t left) {
 int64_t count(A& a, size_t k) { return std::max<int64_t>(a.i(k), 0); }
 
 // Steps of unsigned division by conditional subtraction. The accumulator holds the remainder above the quotient; a
-// step shifts it left by one and, where the divisor goes into the remainder, takes it off and sets the quotient's new
-// bit. Sixteen steps on a dividend in the low half leave the remainder in the high half and the quotient in the low.
+// step shifts it left by one and, where the divisor is not above the remainder, takes it off and sets the quotient's
+// new bit. Sixteen steps on a dividend in the low half leave the remainder in the high half and the quotient in the
+// low.
 int64_t divide_steps(uint32_t acc, uint16_t divisor, int64_t n) {
     for (; n > 0; n--) {
         const uint64_t shifted = uint64_t{acc} << 1, taken = uint64_t{divisor} << 16;

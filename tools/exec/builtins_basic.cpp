@@ -1,5 +1,6 @@
 // The basic operators of saturating arithmetic on `short` (S16) and `long` (S32), as the ETSI and ITU speech coders
-// define them. Products are fractions: twice the integer product. A shift by a negative count is one the other way.
+// define them. Products are fractions: twice the integer product. A shift by a negative count is one in the other
+// direction.
 #include "tools/exec/machine.h"
 
 #include <algorithm>

@@ -42,5 +42,6 @@ struct EXEC_RESULT {
     std::string error;   // what, in which function, at which line
 };
 
-// Runs `main` of a unit that was read whole. What the program prints goes to `out`, the reports to `report`.
+// Runs `main` of a unit that was read whole. What the program prints is written to `out`, reports are written to
+// `report`.
 EXEC_RESULT execute(const IC_UNIT& unit, const EXEC_OPTIONS& options, FILE* out, FILE* report);

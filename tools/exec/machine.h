@@ -183,7 +183,8 @@ struct MACHINE {
     void put_reversed(uint64_t address, unsigned units, uint64_t v);
     int64_t load(const SHAPE& shape, uint64_t address) const; // checked, by shape
     void store(const SHAPE& shape, uint64_t address, int64_t value);
-    // Arguments in the shapes of the parameters; those beyond, in shapes of their own, go to a variadic function.
+    // Arguments in the shapes of the parameters; those beyond, in shapes of their own, are those of a variadic
+    // function.
     int64_t invoke(FUNCTION& f, const int64_t* args, const SHAPE* shapes = nullptr, size_t n = 0);
     // A call through an address, with arguments of any shapes.
     int64_t call(int64_t address, const int64_t* args, const SHAPE* shapes, TYPE* const* types, size_t n,

@@ -79,7 +79,7 @@ private:
         return at < code_m.size() && p.roles[at] &&
                std::find(next_m[at].begin(), next_m[at].end(), p.head) != next_m[at].end();
     }
-    // The test at the bottom: it goes back or out, itself or with the branch behind it.
+    // The test at the bottom: it branches back or out, itself or with the branch behind it.
     bool is_bottom_test(const TRIP_PROMISE& p, uint32_t at) const {
         if (!leaves(ROLE(p.roles[at])) || code_m[at].kind != S_CBRANCH) return false;
         return goes_back(p, at) || (code_m[at + 1].kind == S_BRANCH && goes_back(p, at + 1));

@@ -19,7 +19,7 @@ void find_promised_loops(FUNCTION& f);
 class TRIP_WATCH {
 public:
     explicit TRIP_WATCH(const FUNCTION& f) : f_m(f), backs_m(f.promises.size()) {}
-    // Control goes from a statement to another; `to` is the size of the code when the function returns.
+    // Control passes from a statement to another; `to` is the size of the code when the function returns.
     void step(uint32_t from, uint32_t to, MACHINE& m);
 
 private:

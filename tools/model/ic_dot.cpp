@@ -1,4 +1,4 @@
-// The control flow of a function as a graph: straight runs of statements, and where each may go next.
+// The control flow of a function as a graph: straight runs of statements, and an edge to each run that may follow.
 #include "tools/model/ic_print.h"
 
 #include <map>

@@ -1,4 +1,4 @@
-// The model as a reader's client, and its way back into a file.
+// The model as a reader's client, and how it is written into a file again.
 #include "tools/model/ic_model.h"
 
 #include <new>

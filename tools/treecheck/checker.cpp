@@ -253,8 +253,8 @@ const SURROUNDINGS& behind(const struct LOOP* loop) { return *reinterpret_cast<c
 } // namespace
 
 struct LOOP* SURROUNDINGS::loop() const {
-    loop_seams.givens = [](const struct LOOP* loop) -> const std::vector<NODE*>& { return behind(loop).givens; };
-    loop_seams.is_constant_in = [](const NODE* t, const struct LOOP* loop) {
+    loop_callbacks.givens = [](const struct LOOP* loop) -> const std::vector<NODE*>& { return behind(loop).givens; };
+    loop_callbacks.is_constant_in = [](const NODE* t, const struct LOOP* loop) {
         bool varies = false;
         for_each_node(const_cast<NODE*>(t), [&](const NODE* n) {
             varies = varies || op_has_effect(n->op) ||

@@ -47,7 +47,7 @@ public:
     std::vector<EVENT> events;
     // The program may not do what it did: divided by zero, shifted too far, left an object.
     bool undefined = false;
-    // Of a rewritten tree: a sum of a pointer and numbers may pass null on its way, where the tree as written does not.
+    // Of a rewritten tree: a sum of a pointer and numbers may pass null in between, where the tree as written does not.
     bool null_is_passed = false;
     bool overflowed = false; // a signed operation wrapped
     BITS seed = 0;           // of what calls and volatile reads give

@@ -90,10 +90,10 @@ TEST_F(TypeOps, PointerCastsGoDownAndUp) {
     TYPE* to_long = tp->mk_ptr(tp->long_t);
     auto sum = [&](long n) { return bin(PLUS, name(p), icon(n), p->type); };
     EXPECT_EQ(show(push_down_pointer_cast(to_long, sum(4))), "(long *)(p + 4)"); // nothing is known of the offset
-    type_ops_seams.constant_divides_expr = divides_by_constant;
+    type_ops_callbacks.constant_divides_expr = divides_by_constant;
     EXPECT_EQ(show(push_down_pointer_cast(to_long, sum(3))), "(long *)(p + 3)");
     NODE* t = push_down_pointer_cast(to_long, sum(4));
-    type_ops_seams.constant_divides_expr = nullptr;
+    type_ops_callbacks.constant_divides_expr = nullptr;
     EXPECT_EQ(show(t), "(long *)p + 4");
     EXPECT_EQ(t->type, to_long);
     t = remove_pushed_down_casts(t);

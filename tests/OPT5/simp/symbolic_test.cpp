@@ -25,14 +25,14 @@ struct LOOP* as_loop(ROUND* r) {
 class Symbolic : public Trees {
 protected:
     void SetUp() override {
-        loop_seams.givens = [](const struct LOOP* l) -> const std::vector<NODE*>& { return behind(l)->givens; };
-        loop_seams.parent = [](const struct LOOP* l) { return as_loop(behind(l)->around); };
-        loop_seams.is_constant_in = [](const NODE* t, const struct LOOP* l) {
+        loop_callbacks.givens = [](const struct LOOP* l) -> const std::vector<NODE*>& { return behind(l)->givens; };
+        loop_callbacks.parent = [](const struct LOOP* l) { return as_loop(behind(l)->around); };
+        loop_callbacks.is_constant_in = [](const NODE* t, const struct LOOP* l) {
             return !sym_appears_in_tree(behind(l)->varying, t);
         };
     }
     void TearDown() override {
-        loop_seams = {};
+        loop_callbacks = {};
         for (NODE* t : made) erase_tree(t);
         for (NODE* t : currfuninfo->givens) erase_tree(t);
         currfuninfo->givens.clear();

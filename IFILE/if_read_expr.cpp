@@ -91,24 +91,24 @@ void I_FILE::if_read_expr_pval(BASE_NODE* node) { node->set_edge_profile_value(s
 
 void I_FILE::read_node_payload(BASE_NODE* node) {
     switch (node->op) {
-    case 1: return if_read_expr_label(node);
-    case 2: return if_read_expr_name(node);
-    case 3: return if_read_expr_scon(node);
-    case 4: return if_read_expr_icon(node);
-    case 5: return if_read_expr_fcon(node);
-    case 25: return if_read_expr_lcon(node);
-    case 26: return if_read_expr_field(node);
-    case 40: return if_read_expr_switch(node);
-    case 70: return if_read_expr_call(node);
-    case 72: return if_read_expr_ucall(node);
-    case 110: return if_read_expr_pval(node);
-    case 115: return if_read_expr_skip(node);
-    case 119: return if_read_expr_ddnode(node);
-    case 129:
-    case 130:
-    case 132:
-    case 133: return if_read_expr_icall(node);
-    case 163: return if_read_expr_vreg(node);
+    case if_op::LABEL: return if_read_expr_label(node);
+    case if_op::NAME: return if_read_expr_name(node);
+    case if_op::SCON: return if_read_expr_scon(node);
+    case if_op::ICON: return if_read_expr_icon(node);
+    case if_op::FCON: return if_read_expr_fcon(node);
+    case if_op::LCON: return if_read_expr_lcon(node);
+    case if_op::FIELD: return if_read_expr_field(node);
+    case if_op::SWITCH: return if_read_expr_switch(node);
+    case if_op::CALL: return if_read_expr_call(node);
+    case if_op::UCALL: return if_read_expr_ucall(node);
+    case if_op::EPVAL: return if_read_expr_pval(node);
+    case if_op::SKIP: return if_read_expr_skip(node);
+    case if_op::DDNODE: return if_read_expr_ddnode(node);
+    case if_op::ICALL:
+    case if_op::UICALL:
+    case if_op::MCALL:
+    case if_op::UMCALL: return if_read_expr_icall(node);
+    case if_op::VREG: return if_read_expr_vreg(node);
     }
 }
 
@@ -129,7 +129,7 @@ bool is_floating(const BASE_NODE* node) { return node && node->type && node->typ
 
 void finish_node(BASE_NODE* node, BASE_NODE* left, BASE_NODE* right) {
     node->set_operands(left, right);
-    if (node->op >= 80 && node->op <= 89 && (is_floating(left) || is_floating(right)))
+    if (node->op >= if_op::EQ && node->op <= if_op::UGT && (is_floating(left) || is_floating(right)))
         node->op = if_float_relop(node->op);
 }
 } // namespace
@@ -184,6 +184,6 @@ void I_FILE::if_read_init() {
     std::vector<BASE_NODE*> list;
     do {
         list.push_back(if_read_expr_node(true));
-    } while (list.back()->op != 112); // ENDINIT
+    } while (list.back()->op != if_op::ENDINIT);
     client->cl_symbol_init(sym, list);
 }

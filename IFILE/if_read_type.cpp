@@ -112,7 +112,7 @@ void I_FILE::if_read_void_type(uint64_t n) { enter_type(n, type_pkg->mk_void());
 
 void I_FILE::tp_make_integral_type(uint64_t n, int tag, bool expl_sign, uint64_t size, uint32_t align, bool is_bool,
                                    bool flag) {
-    TYPE::IKIND kind = static_cast<TYPE::IKIND>(tag >= 50 ? tag - 40 : tag);
+    TYPE::IKIND kind = static_cast<TYPE::IKIND>(tag >= IFT_LLONG ? TYPE::ik_llong + (tag - IFT_LLONG) : tag);
     // The first bool says how the type behaves, which `bool` itself always does; the second is a mark on the type, and
     // on an integer that is no boolean there is one other mark.
     bool boolean = kind == TYPE::ik_bool ? flag : is_bool;
@@ -130,7 +130,7 @@ void I_FILE::if_read_integral_type(uint64_t n, int tag) {
 }
 
 void I_FILE::tp_make_float_type(uint64_t n, int tag, uint64_t size, uint32_t align) {
-    TYPE::FKIND kind = tag == 12 ? TYPE::fk_ldouble : tag == 11 ? TYPE::fk_double : TYPE::fk_float;
+    TYPE::FKIND kind = tag == IFT_LDOUBLE ? TYPE::fk_ldouble : tag == IFT_DOUBLE ? TYPE::fk_double : TYPE::fk_float;
     enter_type(n, type_pkg->mk_fltpt(kind, size, align));
 }
 
@@ -270,15 +270,13 @@ void I_FILE::tp_make_csu(uint64_t n, TYPE* type, uint32_t lists) {
 // ---- Lists
 
 namespace {
-constexpr int list_tags[10] = {21, 23, 29, 30, 31, 32, 33, 28, 34, 35}; // tag of an element by list number
-
 bool list_fits(const TYPE* type, int list) {
     switch (type->kind) {
-    case TYPE::tpk_func: return list == 0;
-    case TYPE::tpk_enum: return list == 1;
+    case TYPE::tpk_func: return list == IFL_PARAMS;
+    case TYPE::tpk_enum: return list == IFL_ETORS;
     case TYPE::tpk_class:
     case TYPE::tpk_struct:
-    case TYPE::tpk_union: return list != 1 && list <= 9;
+    case TYPE::tpk_union: return list != IFL_ETORS && list < IF_TYPE_LISTS;
     default: return false;
     }
 }
@@ -286,13 +284,13 @@ bool list_fits(const TYPE* type, int list) {
 // The mark that a class has its list `list`, other than its data members.
 bool& csu_list_mark(CSU_EXTRAS& extras, int list) {
     switch (list) {
-    case 2: return extras.base_classes.present;
-    case 3: return extras.access_decls.present;
-    case 4: return extras.friend_functions.present;
-    case 5: return extras.friend_classes.present;
-    case 6: return extras.nested_types.present;
-    case 8: return extras.static_data.present;
-    case 9: return extras.member_functions.present;
+    case IFL_BCLASSES: return extras.base_classes.present;
+    case IFL_ADECLS: return extras.access_decls.present;
+    case IFL_FFRIENDS: return extras.friend_functions.present;
+    case IFL_CFRIENDS: return extras.friend_classes.present;
+    case IFL_NTYPES: return extras.nested_types.present;
+    case IFL_SDATA: return extras.static_data.present;
+    case IFL_MFUNCS: return extras.member_functions.present;
     default: return extras.parameters.present;
     }
 }
@@ -465,46 +463,48 @@ void I_FILE::if_read_mfunc_elem() {
 }
 
 void I_FILE::read_element(uint64_t n, int tag) {
-    if (!open_list || open_list->number != n || list_tags[open_list->list] != tag) tp_die("Unexpected type attribute");
+    if (!open_list || open_list->number != n || if_list_tags[open_list->list] != tag)
+        tp_die("Unexpected type attribute");
     switch (tag) {
-    case 21: return if_read_param_elem();
-    case 23: return if_read_etor_elem();
-    case 28: return if_read_mdata_elem();
-    case 29: return if_read_bclass_elem();
-    case 30: return if_read_adecl_elem();
-    case 31: return if_read_ffriend_elem();
-    case 32: return if_read_cfriend_elem();
-    case 33: return if_read_ntype_elem();
-    case 34: return if_read_sdata_elem();
-    case 35: return if_read_mfunc_elem();
+    case IFT_PARAM: return if_read_param_elem();
+    case IFT_ETOR: return if_read_etor_elem();
+    case IFT_MDATA: return if_read_mdata_elem();
+    case IFT_BCLASS: return if_read_bclass_elem();
+    case IFT_ADECL: return if_read_adecl_elem();
+    case IFT_FFRIEND: return if_read_ffriend_elem();
+    case IFT_CFRIEND: return if_read_cfriend_elem();
+    case IFT_NTYPE: return if_read_ntype_elem();
+    case IFT_SDATA: return if_read_sdata_elem();
+    case IFT_MFUNC: return if_read_mfunc_elem();
     }
 }
 
 // ---- The section
 
 void I_FILE::read_type(uint64_t n, int tag) {
-    if (tag <= 9 || tag == 50 || tag == 51) return if_read_integral_type(n, tag);
-    if (tag == 26 || tag == 27 || (tag >= 37 && tag <= 48)) { // reserved: nothing is known of what they hold
+    if (tag <= IFT_LAST_SHORT_INTEGER || tag == IFT_LLONG || tag == IFT_ULLONG) return if_read_integral_type(n, tag);
+    if ((tag > IFT_CSU_LONG && tag < IFT_MDATA) ||
+        (tag > IFT_COMPLEX && tag < IFT_VOID)) { // reserved: nothing is known of what they hold
         cursor = limit;
         return;
     }
     switch (tag) {
-    case 10:
-    case 11:
-    case 12: return if_read_float_type(n, tag);
-    case 13: return if_read_fixedpoint_type(n);
-    case 14: return if_read_typedef(n);
-    case 15: return if_read_addr_type(n);
-    case 16: return if_read_ref_type(n);
-    case 17: return if_read_qual_type(n);
-    case 18: return if_read_array_type(n);
-    case 19: return if_read_ptm_type(n);
-    case 20: return if_read_func_type(n);
-    case 22: return if_read_enum_type(n);
-    case 24: return if_read_csu_short(n);
-    case 25: return if_read_csu_long(n);
-    case 36: return if_read_complex_type(n);
-    case 49: return if_read_void_type(n);
+    case IFT_FLOAT:
+    case IFT_DOUBLE:
+    case IFT_LDOUBLE: return if_read_float_type(n, tag);
+    case IFT_FIXEDPOINT: return if_read_fixedpoint_type(n);
+    case IFT_TYPEDEF: return if_read_typedef(n);
+    case IFT_ADDR: return if_read_addr_type(n);
+    case IFT_REF: return if_read_ref_type(n);
+    case IFT_QUAL: return if_read_qual_type(n);
+    case IFT_ARRAY: return if_read_array_type(n);
+    case IFT_PTM: return if_read_ptm_type(n);
+    case IFT_FUNC: return if_read_func_type(n);
+    case IFT_ENUM: return if_read_enum_type(n);
+    case IFT_CSU_SHORT: return if_read_csu_short(n);
+    case IFT_CSU_LONG: return if_read_csu_long(n);
+    case IFT_COMPLEX: return if_read_complex_type(n);
+    case IFT_VOID: return if_read_void_type(n);
     }
     bad_input("type record of unknown tag %d", tag);
 }
@@ -512,11 +512,11 @@ void I_FILE::read_type(uint64_t n, int tag) {
 void I_FILE::if_read_type() {
     uint64_t n = i_read_uint();
     int tag = i_read_u8();
-    if (tag == 254) {
+    if (tag == IFT_LIST_HEADER) {
         if_read_list_header(n);
-    } else if (tag == 255) {
+    } else if (tag == IFT_LIST_TRAILER) {
         if_read_list_trailer(n);
-    } else if (tag == 21 || tag == 23 || (tag >= 28 && tag <= 35)) {
+    } else if (tag == IFT_PARAM || tag == IFT_ETOR || (tag >= IFT_MDATA && tag <= IFT_MFUNC)) {
         read_element(n, tag);
     } else {
         if (open_list)

@@ -92,43 +92,43 @@ void I_FILE::write_node(const BASE_NODE* node) {
     i_write_i8(node->op);
     i_write_typeref(node->type);
     switch (node->op) {
-    case 1: i_write_uint(node->label_id()); break;
-    case 2: write_name(node); break;
-    case 3:
+    case if_op::LABEL: i_write_uint(node->label_id()); break;
+    case if_op::NAME: write_name(node); break;
+    case if_op::SCON:
         i_write_uint(node->scon_length());
         i_write_raw(reinterpret_cast<const uint8_t*>(node->scon_value()), node->scon_length());
         break;
-    case 4:
+    case if_op::ICON:
         if (node->type && node->type->is_signed())
             i_write_sint(node->icon_svalue());
         else
             i_write_uint(node->icon_uvalue());
         break;
-    case 5: i_write_string(node->fcon_value(), 0); break;
-    case 25: i_write_string(node->lcon_value(), 0); break;
-    case 26:
+    case if_op::FCON: i_write_string(node->fcon_value(), 0); break;
+    case if_op::LCON: i_write_string(node->lcon_value(), 0); break;
+    case if_op::FIELD:
         i_write_i8(node->field_kind());
         i_write_uint(node->field_mval()->ordinal);
         i_write_typeref(node->field_csu());
         break;
-    case 40: i_write_uint(node->case_count()); break;
-    case 70:
+    case if_op::SWITCH: i_write_uint(node->case_count()); break;
+    case if_op::CALL:
         i_write_uint(node->call_num_vargs());
         i_write_uint(node->eh_entry_id());
         break;
-    case 72: i_write_uint(node->eh_entry_id()); break;
-    case 110: i_write_uint(node->get_edge_profile_value()); break;
-    case 115: i_write_uint(node->skip_count()); break;
-    case 119:
+    case if_op::UCALL: i_write_uint(node->eh_entry_id()); break;
+    case if_op::EPVAL: i_write_uint(node->get_edge_profile_value()); break;
+    case if_op::SKIP: i_write_uint(node->skip_count()); break;
+    case if_op::DDNODE:
         i_write_uint(node->ddnode_id());
         i_write_uint(node->ddnode_locale());
         i_write_i8(node->ddnode_flags());
         break;
-    case 129:
-    case 130:
-    case 132:
-    case 133: i_write_string(node->icall_name(), 0); break;
-    case 163: i_write_sint(node->vreg_id()); break;
+    case if_op::ICALL:
+    case if_op::UICALL:
+    case if_op::MCALL:
+    case if_op::UMCALL: i_write_string(node->icall_name(), 0); break;
+    case if_op::VREG: i_write_sint(node->vreg_id()); break;
     }
     i_flush(IFR_NODE);
 }

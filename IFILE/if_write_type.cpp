@@ -46,7 +46,7 @@ void I_FILE::begin_type(const TYPE* type, int tag) {
 
 void I_FILE::write_integral_type(TYPE* type) {
     int kind = type->ikind();
-    begin_type(type, kind >= TYPE::ik_llong ? kind + 40 : kind);
+    begin_type(type, kind >= TYPE::ik_llong ? IFT_LLONG + (kind - TYPE::ik_llong) : kind);
     i_write_bool(type->expl_sign());
     i_write_uint(type->size);
     i_write_uint(type->align);
@@ -56,14 +56,14 @@ void I_FILE::write_integral_type(TYPE* type) {
 }
 
 void I_FILE::write_float_type(TYPE* type) {
-    begin_type(type, 10 + type->fkind());
+    begin_type(type, IFT_FLOAT + type->fkind());
     i_write_uint(type->size);
     i_write_uint(type->align);
     i_flush(IFR_TYPE);
 }
 
 void I_FILE::write_fixedpoint_type(TYPE* type) {
-    begin_type(type, 13);
+    begin_type(type, IFT_FIXEDPOINT);
     i_write_i8(type->binpt());
     i_write_bool(type->underlying_type()->is_signed());
     i_write_typeref(type->underlying_type());
@@ -73,7 +73,7 @@ void I_FILE::write_fixedpoint_type(TYPE* type) {
 }
 
 void I_FILE::write_complex_type(TYPE* type) {
-    begin_type(type, 36);
+    begin_type(type, IFT_COMPLEX);
     i_write_uint(type->size);
     i_write_uint(type->align);
     i_write_typeref(type->part_type());
@@ -81,7 +81,7 @@ void I_FILE::write_complex_type(TYPE* type) {
 }
 
 void I_FILE::write_typedef(TYPE* type) {
-    begin_type(type, 14);
+    begin_type(type, IFT_TYPEDEF);
     i_write_string(type->name().c_str(), 0);
     i_write_typeref(type->type_named());
     i_write_uint(type->size);
@@ -101,7 +101,7 @@ void I_FILE::write_addr_type(TYPE* type, int tag, TYPE* target) {
 }
 
 void I_FILE::write_qual_type(TYPE* type) {
-    begin_type(type, 17);
+    begin_type(type, IFT_QUAL);
     i_write_typeref(type->type_qualified());
     i_write_uint(type->own_qual_bits());
     i_write_uint(type->size);
@@ -110,7 +110,7 @@ void I_FILE::write_qual_type(TYPE* type) {
 }
 
 void I_FILE::write_array_type(TYPE* type) {
-    begin_type(type, 18);
+    begin_type(type, IFT_ARRAY);
     i_write_typeref(type->raw_elem_type());
     i_write_uint(type->num_elem());
     i_write_uint(type->size);
@@ -122,7 +122,7 @@ void I_FILE::write_array_type(TYPE* type) {
 }
 
 void I_FILE::write_ptm_type(TYPE* type) {
-    begin_type(type, 19);
+    begin_type(type, IFT_PTM);
     i_write_typeref(type->type_pointed_to());
     i_write_typeref(type->ptm_class());
     i_write_uint(type->size);
@@ -131,20 +131,20 @@ void I_FILE::write_ptm_type(TYPE* type) {
 }
 
 void I_FILE::write_func_type(TYPE* type) {
-    begin_type(type, 20);
+    begin_type(type, IFT_FUNC);
     i_write_typeref(type->return_type());
     i_write_bool(type->vararg());
     i_write_bool(type->proto());
     i_write_i8(static_cast<int>(type->cc_kind()));
     i_write_bool(type->cpp);
     i_flush(IFR_TYPE);
-    write_list_frame(type, 254, 0);
+    write_list_frame(type, IFT_LIST_HEADER, IFL_PARAMS);
     for (const fkPARAM* p = type->params(); p; p = p->next) write_param(type, *p);
-    write_list_frame(type, 255, 0);
+    write_list_frame(type, IFT_LIST_TRAILER, IFL_PARAMS);
 }
 
 void I_FILE::write_enum_type(TYPE* type) {
-    begin_type(type, 22);
+    begin_type(type, IFT_ENUM);
     i_write_string(type->name().c_str(), 0);
     i_write_uint(type->size);
     i_write_uint(type->align);
@@ -173,7 +173,7 @@ void I_FILE::write_csu_type(TYPE* type) {
     for (bool list : before) long_form |= list;
     for (bool list : behind) long_form |= list;
 
-    begin_type(type, long_form ? 25 : 24);
+    begin_type(type, long_form ? IFT_CSU_LONG : IFT_CSU_SHORT);
     i_write_i8(type->kind == TYPE::tpk_struct ? 0 : type->kind == TYPE::tpk_union ? 1 : 2);
     i_write_string(type->name().c_str(), 0);
     i_write_bool(type->is_complete());
@@ -196,13 +196,13 @@ void I_FILE::write_csu_type(TYPE* type) {
 
 void I_FILE::write_type_record(TYPE* type) {
     switch (type->kind) {
-    case TYPE::tpk_void: begin_type(type, 49); return i_flush(IFR_TYPE);
+    case TYPE::tpk_void: begin_type(type, IFT_VOID); return i_flush(IFR_TYPE);
     case TYPE::tpk_int: return write_integral_type(type);
     case TYPE::tpk_float: return write_float_type(type);
     case TYPE::tpk_fixed: return write_fixedpoint_type(type);
     case TYPE::tpk_complex: return write_complex_type(type);
-    case TYPE::tpk_pointer: return write_addr_type(type, 15, type->type_pointed_to());
-    case TYPE::tpk_ref: return write_addr_type(type, 16, type->type_refd());
+    case TYPE::tpk_pointer: return write_addr_type(type, IFT_ADDR, type->type_pointed_to());
+    case TYPE::tpk_ref: return write_addr_type(type, IFT_REF, type->type_refd());
     case TYPE::tpk_qual: return write_qual_type(type);
     case TYPE::tpk_typedef: return write_typedef(type);
     case TYPE::tpk_array: return write_array_type(type);
@@ -224,7 +224,7 @@ void I_FILE::write_list_frame(const TYPE* type, int tag, int list) {
 }
 
 void I_FILE::write_param(const TYPE* owner, const fkPARAM& param) {
-    begin_type(owner, 21);
+    begin_type(owner, IFT_PARAM);
     i_write_typeref(param.type);
     i_write_bool(false);
     i_write_uint(param.word);
@@ -234,9 +234,9 @@ void I_FILE::write_param(const TYPE* owner, const fkPARAM& param) {
 
 void I_FILE::write_listof_etors(const TYPE* type) {
     bool is_signed = type->underlying_type()->is_signed();
-    write_list_frame(type, 254, 1);
+    write_list_frame(type, IFT_LIST_HEADER, IFL_ETORS);
     for (const fkETOR* e = type->etors(); e; e = e->next) {
-        begin_type(type, 23);
+        begin_type(type, IFT_ETOR);
         i_write_string(e->name.c_str(), 0);
         if (is_signed)
             i_write_sint(e->value);
@@ -245,14 +245,14 @@ void I_FILE::write_listof_etors(const TYPE* type) {
         i_write_psn(e->psn);
         i_flush(IFR_TYPE);
     }
-    write_list_frame(type, 255, 1);
+    write_list_frame(type, IFT_LIST_TRAILER, IFL_ETORS);
 }
 
 void I_FILE::write_listof_mdata(const TYPE* type) {
     for (const fkMDATA* m = type->mdata(); m; m = m->next) if_write_type(m->type);
-    write_list_frame(type, 254, 7);
+    write_list_frame(type, IFT_LIST_HEADER, IFL_MDATA);
     for (const fkMDATA* m = type->mdata(); m; m = m->next) {
-        begin_type(type, 28);
+        begin_type(type, IFT_MDATA);
         i_write_uint(m->ordinal);
         i_write_string(m->name.c_str(), 0);
         i_write_typeref(m->type);
@@ -266,22 +266,22 @@ void I_FILE::write_listof_mdata(const TYPE* type) {
         i_write_psn(m->psn);
         i_flush(IFR_TYPE);
     }
-    write_list_frame(type, 255, 7);
+    write_list_frame(type, IFT_LIST_TRAILER, IFL_MDATA);
 }
 
 // One list of a class: the types of its elements, then the framed elements.
 template <class ELEMENT, class TYPE_OF, class FIELDS>
-void I_FILE::write_csu_list(const TYPE* type, int list, int tag, const CSU_LIST<ELEMENT>& elements, TYPE_OF type_of,
+void I_FILE::write_csu_list(const TYPE* type, int list, const CSU_LIST<ELEMENT>& elements, TYPE_OF type_of,
                             FIELDS fields) {
     if (!elements.present) return;
     for (const ELEMENT& e : elements.items) if_write_type(type_of(e));
-    write_list_frame(type, 254, list);
+    write_list_frame(type, IFT_LIST_HEADER, list);
     for (const ELEMENT& e : elements.items) {
-        begin_type(type, tag);
+        begin_type(type, if_list_tags[list]);
         fields(e);
         i_flush(IFR_TYPE);
     }
-    write_list_frame(type, 255, list);
+    write_list_frame(type, IFT_LIST_TRAILER, list);
 }
 
 void I_FILE::write_csu_type_lists(TYPE* type) {
@@ -290,36 +290,36 @@ void I_FILE::write_csu_type_lists(TYPE* type) {
     auto itself = [](TYPE* t) { return t; };
     auto no_type = [](const auto&) -> TYPE* { return nullptr; };
 
-    write_csu_list(type, 2, 29, x.base_classes, its_type, [this](const fkBCLASS& e) {
+    write_csu_list(type, IFL_BCLASSES, x.base_classes, its_type, [this](const fkBCLASS& e) {
         i_write_typeref(e.type);
         i_write_sint(e.offset);
         i_write_i8(e.access);
         i_write_bool(e.is_virtual);
     });
-    write_csu_list(type, 3, 30, x.access_decls, no_type, [this](const fkADECL& e) {
+    write_csu_list(type, IFL_ADECLS, x.access_decls, no_type, [this](const fkADECL& e) {
         i_write_uint(0);
         i_write_i8(e.access);
     });
-    write_csu_list(type, 4, 31, x.friend_functions, its_type, [this](const fkFFRIEND& e) {
+    write_csu_list(type, IFL_FFRIENDS, x.friend_functions, its_type, [this](const fkFFRIEND& e) {
         i_write_string(e.name.c_str(), 0);
         i_write_typeref(e.type);
     });
-    write_csu_list(type, 5, 32, x.friend_classes, itself, [this](TYPE* t) { i_write_typeref(t); });
-    write_csu_list(type, 6, 33, x.nested_types, itself, [this](TYPE* t) { i_write_typeref(t); });
+    write_csu_list(type, IFL_CFRIENDS, x.friend_classes, itself, [this](TYPE* t) { i_write_typeref(t); });
+    write_csu_list(type, IFL_NTYPES, x.nested_types, itself, [this](TYPE* t) { i_write_typeref(t); });
     if (type->has_mdata_list()) write_listof_mdata(type);
-    write_csu_list(type, 8, 34, x.static_data, its_type, [this](const fkSDATA& e) {
+    write_csu_list(type, IFL_SDATA, x.static_data, its_type, [this](const fkSDATA& e) {
         i_write_string(e.name.c_str(), 0);
         i_write_typeref(e.type);
         i_write_i8(e.access);
     });
-    write_csu_list(type, 9, 35, x.member_functions, its_type, [this](const fkMFUNC& e) {
+    write_csu_list(type, IFL_MFUNCS, x.member_functions, its_type, [this](const fkMFUNC& e) {
         i_write_string(e.name.c_str(), 0);
         i_write_typeref(e.type);
         i_write_i8(e.access);
         i_write_sint(e.word);
         for (bool flag : e.flags) i_write_bool(flag);
     });
-    write_csu_list(type, 0, 21, x.parameters, its_type, [this](const fkPARAM& e) {
+    write_csu_list(type, IFL_PARAMS, x.parameters, its_type, [this](const fkPARAM& e) {
         i_write_typeref(e.type);
         i_write_bool(false);
         i_write_uint(e.word);

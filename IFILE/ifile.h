@@ -55,11 +55,72 @@ enum IF_RECORD_KIND : uint8_t {
 };
 const char* if_record_name(int kind); // a label for people, "unknown" for a kind that is none
 
+// The tags of type records. An integer's is its IKIND up to 9, and 40 more than that from `long long` on.
+enum IF_TYPE_TAG : uint8_t {
+    IFT_LAST_SHORT_INTEGER = 9,
+    IFT_FLOAT = 10,
+    IFT_DOUBLE = 11,
+    IFT_LDOUBLE = 12,
+    IFT_FIXEDPOINT = 13,
+    IFT_TYPEDEF = 14,
+    IFT_ADDR = 15,
+    IFT_REF = 16,
+    IFT_QUAL = 17,
+    IFT_ARRAY = 18,
+    IFT_PTM = 19,
+    IFT_FUNC = 20,
+    IFT_PARAM = 21,
+    IFT_ENUM = 22,
+    IFT_ETOR = 23,
+    IFT_CSU_SHORT = 24,
+    IFT_CSU_LONG = 25,
+    IFT_MDATA = 28,
+    IFT_BCLASS = 29,
+    IFT_ADECL = 30,
+    IFT_FFRIEND = 31,
+    IFT_CFRIEND = 32,
+    IFT_NTYPE = 33,
+    IFT_SDATA = 34,
+    IFT_MFUNC = 35,
+    IFT_COMPLEX = 36,
+    IFT_VOID = 49,
+    IFT_LLONG = 50,
+    IFT_ULLONG = 51,
+    IFT_LIST_HEADER = 254,
+    IFT_LIST_TRAILER = 255,
+};
+// The lists of a type by number, and the tag of an element of each.
+enum IF_TYPE_LIST : uint8_t {
+    IFL_PARAMS,
+    IFL_ETORS,
+    IFL_BCLASSES,
+    IFL_ADECLS,
+    IFL_FFRIENDS,
+    IFL_CFRIENDS,
+    IFL_NTYPES,
+    IFL_MDATA,
+    IFL_SDATA,
+    IFL_MFUNCS,
+    IF_TYPE_LISTS
+};
+constexpr uint8_t if_list_tags[IF_TYPE_LISTS] = {IFT_PARAM,   IFT_ETOR,  IFT_BCLASS, IFT_ADECL, IFT_FFRIEND,
+                                                 IFT_CFRIEND, IFT_NTYPE, IFT_MDATA,  IFT_SDATA, IFT_MFUNC};
+constexpr uint8_t IF_LEAF_FUNCTION = 76; // the byte of IFR_FUNC_INFO: the function calls nothing
+
 constexpr char IF_MAGIC[] = "!<icode>\n";
 constexpr int IF_VERSION = -71;        // written
 constexpr int IF_VERSION_OLDEST = -86; // read from here up to IF_VERSION
 constexpr int IF_CPU_ID = 600;
-constexpr int IF_MAX_OPCODE = 163;
+
+// The opcodes of if_nodes.def by name.
+namespace if_op {
+enum : int {
+#define IF_NODE(op, name, count) name = op,
+#include "IFILE/if_nodes.def"
+#undef IF_NODE
+};
+} // namespace if_op
+constexpr int IF_MAX_OPCODE = if_op::VREG;
 // Trees nested deeper are refused: the walkers recurse, and this is what their stack is laid out for.
 constexpr int IF_MAX_TREE_DEPTH = 200000;
 // The same for derived types, and for structures within structures.
@@ -82,7 +143,8 @@ struct IF_NODE_INFO {
     const char* name = nullptr; // null: no such opcode
     int operand_count = 255;
 };
-extern IF_NODE_INFO if_node_info[201];
+constexpr int IF_NODE_TABLE_SIZE = 201; // the optimizer has opcodes beyond those of the file
+extern IF_NODE_INFO if_node_info[IF_NODE_TABLE_SIZE];
 void if_node_table_init(); // fills it, once per process
 void if_enter_node(int op, const char* name, int operand_count);
 // Opcode that a relational operator becomes where an operand is floating, or the opcode itself.
@@ -445,8 +507,7 @@ private:
     void write_list_frame(const TYPE* type, int tag, int list);
     void write_param(const TYPE* owner, const fkPARAM& param);
     template <class ELEMENT, class TYPE_OF, class FIELDS>
-    void write_csu_list(const TYPE* type, int list, int tag, const CSU_LIST<ELEMENT>& elements, TYPE_OF type_of,
-                        FIELDS fields);
+    void write_csu_list(const TYPE* type, int list, const CSU_LIST<ELEMENT>& elements, TYPE_OF type_of, FIELDS fields);
     void write_listof_etors(const TYPE* type);
     void write_listof_mdata(const TYPE* type);
 };

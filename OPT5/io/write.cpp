@@ -173,8 +173,7 @@ void write_func_body() {
     write_locals(f);
     wrstcr(IFR_END_LOCALS, f->end_locals_psn);
     if (!calls_are_written) {
-        constexpr uint8_t LEAF = 76;
-        o_file->if_write_func_info(LEAF);
+        o_file->if_write_func_info(IF_LEAF_FUNCTION);
         debug_printf("%s is a leaf function\n", f->name.c_str());
     }
     write_register_assignments();

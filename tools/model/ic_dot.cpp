@@ -3,6 +3,8 @@
 
 #include <map>
 
+using namespace if_op;
+
 namespace {
 struct BLOCK {
     std::string text;
@@ -21,29 +23,29 @@ std::string escaped(const std::string& line) {
     return text + "\\l";
 }
 
-uint32_t target(const IC_NODE* label) { return label && label->op == 1 ? label->number : 0; }
+uint32_t target(const IC_NODE* label) { return label && label->op == LABEL ? label->number : 0; }
 
 // What a statement does to the block that it ends; false if it ends none.
 bool end_block(const IC_NODE* t, BLOCK& block) {
     switch (t->op) {
-    case 36:
-    case 118:
+    case RETURN:
+    case URETURN:
         block.falls_through = false;
         block.returns = true;
         return true;
-    case 114:
+    case BRANCH:
         block.falls_through = false;
         block.jumps.emplace_back(target(t->left), "");
         return true;
-    case 109: block.jumps.emplace_back(target(t->right), "false"); return true;
-    case 40: {
+    case CBRANCH: block.jumps.emplace_back(target(t->right), "false"); return true;
+    case SWITCH: {
         block.falls_through = false;
         const IC_NODE* arm = t->right;
         for (;; arm = arm->left) {
-            const IC_NODE* one = arm && arm->op == 56 ? arm->right : arm;
-            if (one && one->op == 47) block.jumps.emplace_back(target(one->right), "case");
-            if (one && one->op == 46) block.jumps.emplace_back(target(one->left), "default");
-            if (!arm || arm->op != 56) return true;
+            const IC_NODE* one = arm && arm->op == COMMA ? arm->right : arm;
+            if (one && one->op == CASE) block.jumps.emplace_back(target(one->right), "case");
+            if (one && one->op == DEFAULT) block.jumps.emplace_back(target(one->left), "default");
+            if (!arm || arm->op != COMMA) return true;
         }
     }
     }

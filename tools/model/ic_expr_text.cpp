@@ -3,6 +3,8 @@
 // Operators that C has are written as in C, with the parentheses that C would need; the others as calls by their names.
 #include "tools/model/ic_print.h"
 
+using namespace if_op;
+
 namespace {
 enum : int { prec_comma = 1, prec_assign = 2, prec_quest = 3, prec_unary = 14, prec_postfix = 15, prec_leaf = 99 };
 
@@ -12,14 +14,15 @@ struct BINARY {
     int prec;
 };
 const BINARY binaries[] = {
-    {6, "+", 12},       {7, "+=", 2},       {8, "-", 12},    {9, "-=", 2},     {11, "*", 13},   {12, "*=", 2},
-    {14, "&", 8},       {15, "&=", 2},      {17, "|", 6},    {18, "|=", 2},    {19, "^", 7},    {20, "^=", 2},
-    {23, "&&", 5},      {24, "||", 4},      {56, ",", 1},    {57, ",", 1},     {58, "=", 2},    {59, ",", 1},
-    {60, "/", 13},      {61, "/=", 2},      {62, "%", 13},   {63, "%=", 2},    {64, "<<", 11},  {65, "<<=", 2},
-    {66, ">>", 11},     {67, ">>=", 2},     {80, "==", 9},   {81, "!=", 9},    {82, "<=", 10},  {83, "<", 10},
-    {84, ">=", 10},     {85, ">", 10},      {86, "<=u", 10}, {87, "<u", 10},   {88, ">=u", 10}, {89, ">u", 10},
-    {98, "=struct", 2}, {103, "=array", 2}, {143, "==f", 9}, {145, "<=f", 10}, {146, "<f", 10}, {147, ">=f", 10},
-    {148, ">f", 10},    {150, "!=f", 9},
+    {PLUS, "+", 12},    {PLUSASG, "+=", 2},    {MINUS, "-", 12},     {MINUSASG, "-=", 2}, {MULT, "*", 13},
+    {MULTASG, "*=", 2}, {ANDB, "&", 8},        {ANDBASG, "&=", 2},   {ORB, "|", 6},       {ORBASG, "|=", 2},
+    {XORB, "^", 7},     {XORBASG, "^=", 2},    {ANDAND, "&&", 5},    {OROR, "||", 4},     {COMMA, ",", 1},
+    {PCOMMA, ",", 1},   {ASG, "=", 2},         {COMMAOP, ",", 1},    {DIV, "/", 13},      {DIVASG, "/=", 2},
+    {MOD, "%", 13},     {MODASG, "%=", 2},     {SLL, "<<", 11},      {SLLASG, "<<=", 2},  {SRL, ">>", 11},
+    {SRLASG, ">>=", 2}, {EQ, "==", 9},         {NEQ, "!=", 9},       {LE, "<=", 10},      {LT, "<", 10},
+    {GE, ">=", 10},     {GT, ">", 10},         {ULE, "<=u", 10},     {ULT, "<u", 10},     {UGE, ">=u", 10},
+    {UGT, ">u", 10},    {STASG, "=struct", 2}, {ARASG, "=array", 2}, {FEQ, "==f", 9},     {FLE, "<=f", 10},
+    {FLT, "<f", 10},    {FGE, ">=f", 10},      {FGT, ">f", 10},      {FNEQN, "!=f", 9},
 };
 
 const BINARY* find_binary(int op) {
@@ -33,11 +36,11 @@ const BINARY* find_binary(int op) {
 
 const char* prefix_text(int op) {
     switch (op) {
-    case 10: return "-";
-    case 13: return "*";
-    case 16: return "&";
-    case 76: return "!";
-    case 77: return "~";
+    case UMINUS: return "-";
+    case UMULT: return "*";
+    case UAND: return "&";
+    case EXCLAIM: return "!";
+    case NOTB: return "~";
     }
     return nullptr;
 }
@@ -60,7 +63,7 @@ private:
     void type_of(const IC_NODE* t) { text += t->type ? t->type->printstr() : "no type"; }
     void number(uint32_t n) { text += std::to_string(n); }
     void label(const IC_NODE* t) {
-        if (t && t->op == 1) {
+        if (t && t->op == LABEL) {
             text += 'L';
             number(t->number);
         } else {
@@ -76,13 +79,13 @@ int PRINTER::precedence(const IC_NODE* t) {
     if (const BINARY* b = find_binary(t->op)) return b->prec;
     if (prefix_text(t->op) && !t->right) return prec_unary;
     switch (t->op) {
-    case 21: return prec_quest;
-    case 104:
-    case 105: return prec_unary;
-    case 68:
-    case 69:
-    case 70:
-    case 72: return prec_postfix;
+    case QUEST: return prec_quest;
+    case SCONV:
+    case PCONV: return prec_unary;
+    case STDOT:
+    case STREF:
+    case CALL:
+    case UCALL: return prec_postfix;
     }
     return prec_leaf;
 }
@@ -92,7 +95,8 @@ void PRINTER::expr(const IC_NODE* t, int outer) {
         text += "(nothing)";
         return;
     }
-    bool show_type = options_m.types && t->op != 1 && t->op != 2 && t->op != 26 && t->op != 56 && t->op != 112;
+    bool show_type =
+        options_m.types && t->op != LABEL && t->op != NAME && t->op != FIELD && t->op != COMMA && t->op != ENDINIT;
     bool parentheses = precedence(t) < outer || (show_type && precedence(t) != prec_leaf);
     if (parentheses) text += '(';
     plain(t, outer);
@@ -119,30 +123,30 @@ void PRINTER::plain(const IC_NODE* t, int) {
         return expr(t->left, prec_unary);
     }
     switch (t->op) {
-    case 21: // QUEST over COLON
-        if (!t->right || t->right->op != 22) break;
+    case QUEST: // over a COLON
+        if (!t->right || t->right->op != COLON) break;
         expr(t->left, prec_quest + 1);
         text += " ? ";
         expr(t->right->left, prec_quest + 1);
         text += " : ";
         return expr(t->right->right, prec_quest);
-    case 104:
-    case 105:
+    case SCONV:
+    case PCONV:
         text += '(';
         type_of(t);
         text += ')';
         return expr(t->left, prec_unary);
-    case 68:
-    case 69:
+    case STDOT:
+    case STREF:
         expr(t->left, prec_postfix);
-        text += t->op == 68 ? "." : "->";
+        text += t->op == STDOT ? "." : "->";
         return expr(t->right, prec_postfix);
-    case 70:
-    case 72:
-    case 129:
-    case 130:
-    case 132:
-    case 133: return call(t);
+    case CALL:
+    case UCALL:
+    case ICALL:
+    case UICALL:
+    case MCALL:
+    case UMCALL: return call(t);
     }
     if (if_node_info[t->op].operand_count == 0)
         leaf(t);
@@ -168,16 +172,16 @@ void PRINTER::string_constant(const IC_NODE* t) {
 
 void PRINTER::leaf(const IC_NODE* t) {
     switch (t->op) {
-    case 1: return label(t);
-    case 2: text += t->sym ? t->sym->name : "(no symbol)"; return;
-    case 3: return string_constant(t);
-    case 4: text += std::to_string(t->value); return;
-    case 5:
-    case 25: text += t->text; return;
-    case 26:
+    case LABEL: return label(t);
+    case NAME: text += t->sym ? t->sym->name : "(no symbol)"; return;
+    case SCON: return string_constant(t);
+    case ICON: text += std::to_string(t->value); return;
+    case FCON:
+    case LCON: text += t->text; return;
+    case FIELD:
         text += t->member->name.empty() ? "(unnamed " + std::to_string(t->member->ordinal) + ")" : t->member->name;
         return;
-    case 163: text += "vreg" + std::to_string(t->vreg_id()); return;
+    case VREG: text += "vreg" + std::to_string(t->vreg_id()); return;
     default: text += if_node_info[t->op].name;
     }
 }
@@ -185,7 +189,7 @@ void PRINTER::leaf(const IC_NODE* t) {
 // The elements of a left-leaning list, first to last.
 void PRINTER::list(const IC_NODE* t) {
     std::vector<const IC_NODE*> elements;
-    for (; t && t->op == 56; t = t->left) elements.push_back(t->right);
+    for (; t && t->op == COMMA; t = t->left) elements.push_back(t->right);
     elements.push_back(t);
     for (size_t i = elements.size(); i-- > 0;) {
         expr(elements[i], prec_comma + 1);
@@ -194,10 +198,10 @@ void PRINTER::list(const IC_NODE* t) {
 }
 
 void PRINTER::call(const IC_NODE* t) {
-    bool by_symbol = t->op == 70 || t->op == 72;
+    bool by_symbol = t->op == CALL || t->op == UCALL;
     if (!by_symbol)
         text += t->text;
-    else if (t->left && t->left->op == 16 && t->left->left && t->left->left->op == 2)
+    else if (t->left && t->left->op == UAND && t->left->left && t->left->left->op == NAME)
         leaf(t->left->left);
     else
         expr(t->left, prec_postfix);
@@ -206,15 +210,15 @@ void PRINTER::call(const IC_NODE* t) {
     if (arguments) list(arguments);
     text += ')';
     if (by_symbol && t->number2) text += "{unwind " + std::to_string(t->number2) + "}";
-    if (t->op == 70 && t->number) text += "{variable " + std::to_string(t->number) + "}";
+    if (t->op == CALL && t->number) text += "{variable " + std::to_string(t->number) + "}";
 }
 
 void PRINTER::by_name(const IC_NODE* t) {
     text += if_node_info[t->op].name;
     switch (t->op) {
-    case 110:
-    case 115: text += '{' + std::to_string(t->number) + '}'; break;
-    case 119:
+    case EPVAL:
+    case SKIP: text += '{' + std::to_string(t->number) + '}'; break;
+    case DDNODE:
         text += '{' + std::to_string(t->number) + ", locale " + std::to_string(t->number2) + ", flags " +
                 std::to_string(t->ddnode_flags()) + '}';
         break;
@@ -234,17 +238,17 @@ void PRINTER::switch_statement(const IC_NODE* t) {
     text += ") {";
     std::vector<const IC_NODE*> arms;
     const IC_NODE* arm = t->right;
-    for (; arm && arm->op == 56; arm = arm->left) arms.push_back(arm->right);
+    for (; arm && arm->op == COMMA; arm = arm->left) arms.push_back(arm->right);
     arms.push_back(arm);
     for (size_t i = arms.size(); i-- > 0;) {
         const IC_NODE* a = arms[i];
         text += ' ';
-        if (a && a->op == 47) {
+        if (a && a->op == CASE) {
             text += "case ";
             expr(a->left, 0);
             text += ": ";
             label(a->right);
-        } else if (a && a->op == 46) {
+        } else if (a && a->op == DEFAULT) {
             text += "default: ";
             label(a->left);
         } else {
@@ -257,15 +261,15 @@ void PRINTER::switch_statement(const IC_NODE* t) {
 
 void PRINTER::statement(const IC_NODE* t) {
     switch (t->op) {
-    case 36: text += "return "; return expr(t->right, 0);
-    case 118: text += "return"; return;
-    case 114: text += "goto "; return label(t->left);
-    case 109: // the branch is taken when the condition is false
+    case RETURN: text += "return "; return expr(t->right, 0);
+    case URETURN: text += "return"; return;
+    case BRANCH: text += "goto "; return label(t->left);
+    case CBRANCH: // the branch is taken when the condition is false
         text += "if (!(";
         expr(t->left, 0);
         text += ")) goto ";
         return label(t->right);
-    case 40: return switch_statement(t);
+    case SWITCH: return switch_statement(t);
     default: expr(t, 0);
     }
 }

@@ -130,7 +130,7 @@ void LISTING::symbol(size_t index, const IC_SYMBOL& s) {
         pragma(*p);
     }
     for (const IC_NODE* tree : s.init)
-        if (tree->op != 112) std::fprintf(out_m, "         = %s\n", expr(tree).c_str());
+        if (tree->op != if_op::ENDINIT) std::fprintf(out_m, "         = %s\n", expr(tree).c_str());
 }
 
 // ---- Body

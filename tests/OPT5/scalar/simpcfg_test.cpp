@@ -19,6 +19,9 @@ protected:
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) ++n;
         return n;
     }
+    NODE* constant_case(long value, int to) {
+        return maketree(CASE, mk_ICON(INT65(value), tp->int_t), ref(to), tp->int_t);
+    }
 };
 
 TEST_F(SimpcfgTest, ALoopThatDoesNothingStays) {

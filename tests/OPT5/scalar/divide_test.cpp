@@ -1,17 +1,18 @@
 // Division by constants: the reciprocals for every divisor of 16 bits, and the sequences as trees at every width.
 
+#include "../ir/evaluator.h"
 #include "../ir/function_fixture.h"
 
 #include "OPT5/scalar/divide.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/target.h"
-#include "tools/treecheck/evaluator.h"
 
 #include <random>
 
 namespace {
 
-using I128 = __int128;
+using test_trees::EVALUATOR;
+using test_trees::I128;
 using U128 = unsigned __int128;
 
 uint64_t scaled(const RECIPROCAL& r, uint64_t x) {
@@ -73,36 +74,23 @@ protected:
         return values;
     }
 
-    // Of a world of its own, whose evaluator knows where the dividend lies.
-    static SYMTAB* dividend(const TYPE* type) {
-        for (SYMTAB* s : treecheck::world().integers)
-            if (s->type == type) return s;
-        return nullptr;
-    }
-
-    static treecheck::BITS value(const NODE* tree, const SYMTAB* x, I128 is) {
-        treecheck::EVALUATOR machine;
-        for (unsigned n = 0; n < x->type->size / 16; ++n)
-            machine.memory[treecheck::world().address(x) + n] = static_cast<uint16_t>(is >> 16 * n);
-        const treecheck::BITS v = machine.eval(tree);
-        EXPECT_FALSE(machine.undefined);
-        return v;
-    }
-
     void expect_equal(int op, TYPE* type, INT65 divisor, bool must_go) {
-        const SYMTAB* x = dividend(type);
-        NODE* division = maketree(op, mk_NAME(const_cast<SYMTAB*>(x)), mk_ICON(divisor, type), type);
+        SYMTAB* x = local("x", type);
+        NODE* division = maketree(op, mk_NAME(x), mk_ICON(divisor, type), type);
         NODE* original = copy_tree(division);
         NODE* sequence = warp_DIV_to_MULT(division);
         if (must_go) {
             EXPECT_FALSE(tree_contains_op(sequence, DIV) || tree_contains_op(sequence, MOD)) << tree_to_infix(original);
         }
         sequence = simp_tree(sequence, nullptr);
+        EVALUATOR machine;
         const I128 c = static_cast<I128>(divisor.value) - (divisor.is_negative() ? I128(1) << 64 : 0);
-        for (I128 is : dividends(type, c)) {
-            if (is == -(I128(1) << (type->size - 1)) && c == -1) continue; // overflows
-            ASSERT_EQ(value(sequence, x, is), value(original, x, is))
-                << tree_to_infix(original) << " of " << static_cast<long long>(is) << " by " << tree_to_infix(sequence);
+        for (I128 value : dividends(type, c)) {
+            if (value == -(I128(1) << (type->size - 1)) && c == -1) continue; // overflows
+            machine.variables[x] = test_trees::integer(value, test_trees::shape(type));
+            const auto want = machine.eval(original), got = machine.eval(sequence);
+            ASSERT_EQ(got, want) << tree_to_infix(original) << " of " << static_cast<long long>(value) << " by "
+                                 << tree_to_infix(sequence);
         }
         erase_tree(original);
         erase_tree(sequence);

@@ -114,22 +114,6 @@ TEST_F(Diag, WrapsAtBlanks) {
     }
 }
 
-TEST_F(Diag, LineThatIsFullStartsANewOne) {
-    DIAGNOSTIC::diag_cols_m = 20;
-    class two_parts : public DIAG::text_message {
-    public:
-        two_parts() : text_message(24003, "f", 1, "") {}
-        void report() override {
-            print_header();
-            print("%s", "12345678901"); // "warning: " and these fill the line
-            print("%s", "x");
-            flush();
-        }
-    };
-    two_parts().report();
-    EXPECT_EQ(take(), "warning: 12345678901\n   x\n");
-}
-
 TEST_F(Diag, IndentAndNoWrapping) {
     DIAGNOSTIC::diag_cols_m = 20;
     DIAGNOSTIC::push_indent(2);
@@ -139,13 +123,6 @@ TEST_F(Diag, IndentAndNoWrapping) {
     DIAGNOSTIC::wrap_enabled_m = false;
     umsg->error("one two three four five six");
     EXPECT_EQ(take(), "error: one two three four five six\n");
-}
-
-TEST_F(Diag, BufferFormWrapsAt79WithIndent10) {
-    const std::string word(30, 'w');
-    char* const text = DIAGNOSTIC::sp_print("%s %s %s", word.c_str(), word.c_str(), word.c_str());
-    EXPECT_EQ(std::string(text), word + " " + word + "\n          " + word);
-    std::free(text);
 }
 
 TEST_F(Diag, SeverityOverrides) {
@@ -190,23 +167,6 @@ TEST_F(Diag, DebugModeNeitherCountsNorEnds) {
     EXPECT_NE(take().find("fatal error: f\n"), std::string::npos);
     EXPECT_EQ(umsg->get_error_count(), 0);
     EXPECT_FALSE(DIAGNOSTIC::debug_mode_m);
-}
-
-TEST_F(Diag, AdviceComparesItsText) {
-    const DIAG_SRCINFO_DATA at("x.c", 7, 3), elsewhere("x.c", 8, 3);
-    DIAG::gadvice a("f", 1, "same"), b("f", 2, "same"), c("f", 1, "other"), d("f", 1, "same"), e("f", 1, "same");
-    d.set_src(&at);
-    e.set_src(&elsewhere);
-    EXPECT_TRUE(a.is_equal(&b));
-    EXPECT_FALSE(a.is_equal(&c));
-    EXPECT_FALSE(a.is_equal(&d));
-    EXPECT_FALSE(d.is_equal(&e));
-    DIAGNOSTIC* const copy = d.alloc();
-    EXPECT_TRUE(copy->is_equal(&d));
-    EXPECT_STREQ(copy->get_sp_buffer(), "same");
-    delete copy;
-    c.free_mem();
-    EXPECT_TRUE(a.is_equal(&c)) << "one without text equals any";
 }
 
 TEST_F(Diag, ShowsTheSourceLine) {

@@ -89,14 +89,6 @@ TEST(primitives, positions) {
                          rec(IFR_END_LOCALS, by({2, 1, 1})) + rec(IFR_END_LOCALS, by({1, 4, 5})));
 }
 
-TEST(primitives, frames_of_every_size) {
-    for (size_t length : {0, 1, 126, 127, 128, 16382, 16383, 40000, 3000000}) {
-        WORLD world;
-        std::string text(length, 'x');
-        EXPECT_EQ(written(world, [&](I_FILE& f) { f.if_write_comment(text.c_str()); }), rec(IFR_COMMENT, str(text)));
-    }
-}
-
 TEST(primitives, levels_follow_the_brackets) {
     WORLD world;
     IC_SYMBOL sym;
@@ -154,27 +146,4 @@ TEST(primitives, misuse_ends_the_run) {
                 "INTERNAL ERROR: Invalid opcode, aborting");
 }
 
-TEST(tables, opcodes_and_pragma_names) {
-    if_node_table_init();
-    const struct {
-        int op;
-        const char* name;
-        int count;
-    } cases[] = {{0, "NOP", 0},       {1, "LABEL", 0},    {36, "RETURN", 2},   {40, "SWITCH", 2},   {46, "DEFAULT", 1},
-                 {47, "CASE", 2},     {70, "CALL", 2},    {72, "UCALL", 1},    {109, "CBRANCH", 2}, {110, "EPVAL", 1},
-                 {112, "ENDINIT", 0}, {114, "BRANCH", 1}, {118, "URETURN", 1}, {119, "DDNODE", 1},  {130, "UICALL", 0},
-                 {132, "MCALL", 1},   {163, "VREG", 0}};
-    for (const auto& c : cases) {
-        EXPECT_STREQ(if_node_info[c.op].name, c.name);
-        EXPECT_EQ(if_node_info[c.op].operand_count, c.count);
-    }
-    for (int gap : {28, 71, 111, 126, 137, 162}) EXPECT_EQ(if_node_info[gap].name, nullptr) << gap;
-    const std::pair<int, int> relops[] = {{80, 143}, {81, 150}, {82, 145}, {86, 145}, {83, 146}, {87, 146}, {84, 147},
-                                          {88, 147}, {85, 148}, {89, 148}, {79, 79},  {90, 90},  {144, 144}};
-    for (auto [op, becomes] : relops) EXPECT_EQ(if_float_relop(op), becomes);
-    EXPECT_STREQ(PRAGMA::name(3), "FUNC_NEVER_RETURNS");
-    EXPECT_STREQ(PRAGMA::name(69), "COMDAT GROUP");
-    EXPECT_STREQ(PRAGMA::name(128), "NOINLINE");
-    EXPECT_STREQ(PRAGMA::name(129), "unknown");
-}
 } // namespace

@@ -167,21 +167,6 @@ TEST(records, of_the_body) {
     expect_round_trip(file.build());
 }
 
-TEST(records, written_bytes) {
-    WORLD world;
-    FILE_BUILDER file;
-    std::string records =
-        rec(IFR_LOOP, by({1, 1, 2}) + un(UINT32_MAX) + by({3, 0xFE, 0})) + rec(IFR_LOOP_VAR, by({1, 0, 1, 3})) +
-        rec(IFR_LOOP_VAR, by({2, 0x7F, 0x7F, 0})) + rec(IFR_DEP_VECTOR, by({0, 2, 2, 0x0F, 0xFE, 0x10, 1})) +
-        rec(IFR_DEP_EDGE, by({1, 2, 0})) + rec(IFR_LDSPEC, by({1, 0, 5, 0x7F, 0, 0, 1})) +
-        rec(IFR_LDSPEC, by({2, 1, 5, 6, 0, 0x7F, 0})) + rec(IFR_LDSPEC, by({3, 2, 70})) + rec(IFR_EHT_HEADER, by({2})) +
-        rec(IFR_EHT_ENTRY, by({1, 2, 0, 0})) + rec(IFR_CATCH_LIST, "") + rec(IFR_EHT_ENTRY, by({2, 1, 1, 0})) +
-        rec(IFR_EXPR, no_psn) + node(2, 0, by({0, 1})) + rec(IFR_EXPR, no_psn) + node(2, 0, un(UINT32_MAX) + by({0}));
-    file.statements = records;
-    world.read(file.build());
-    EXPECT_NE(world.write().find(records), std::string::npos);
-}
-
 TEST(records, of_back_ends_are_passed_over) {
     WORLD world;
     FILE_BUILDER file;
@@ -192,21 +177,6 @@ TEST(records, of_back_ends_are_passed_over) {
     EXPECT_EQ(world.unit.items.size(), 4u);
     EXPECT_EQ(world.unit.globals.size(), 2u);
     EXPECT_EQ(world.unit.file()->level, 0);
-}
-
-TEST(records, positions_without_a_file) {
-    for (bool with_table : {false, true}) {
-        WORLD world;
-        FILE_BUILDER file;
-        if (with_table) file.files = rec(IFR_FILE_NAME, str("a.c"));
-        file.statements = rec(IFR_EXPR, by({2, 30, 4}));
-        world.read(file.build());
-        const PSN* psn = world.unit.items[3].psn;
-        ASSERT_NE(psn, nullptr);
-        EXPECT_EQ(psn->file, nullptr);
-        EXPECT_EQ(psn->line, 30);
-        EXPECT_EQ(psn->column, 4);
-    }
 }
 
 TEST(symbols, fields_and_retention) {

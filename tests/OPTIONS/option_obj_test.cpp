@@ -219,42 +219,6 @@ TEST(OptionExport, RoundTripsEveryOption) {
     EXPECT_GT(seen, 66 + 30);
 }
 
-TEST(OptionTables, ValuesThatTheFlagsTest) {
-    struct CASE {
-        const char* word;
-        int id;
-        long value;
-    };
-    const CASE cases[] = {
-        {"-opt_level=off", 46, 38},
-        {"-opt_level=0", 46, 33},
-        {"-opt_level=1", 46, 34},
-        {"-opt_level=2", 46, 35},
-        {"-opt_level=3", 46, 36},
-        {"-opt_level=4", 46, 37},
-        {"-size_speed_goal=5", 58, 43},
-        {"-size_speed_goal=4", 58, 47},
-        {"-size_speed_goal=3", 58, 45},
-        {"-size_speed_goal=2", 58, 46},
-        {"-size_speed_goal=1", 58, 48},
-        {"-size_speed_goal=0", 58, 44},
-        {"-abi=eabi", 1, 2},
-        {"-endian=big", 20, 8},
-        {"-fp_mode=strict", 23, 14},
-        {"-fp_mode=relaxed", 23, 13},
-        {"-fp_reassoc=off", 24, 15},
-        {"-sat_reassoc=on", 54, 40},
-        {"-float_support=fpu32", 22, 10},
-        {"-float_support=fpu64", 22, 11},
-        {"-mem_model:data=flat", 38, 30},
-    };
-    for (const CASE& c : cases) {
-        O o;
-        ASSERT_TRUE(o.process_option(c.word, nullptr)) << c.word;
-        EXPECT_EQ(o.getnumarg(c.id), c.value) << c.word;
-    }
-}
-
 TEST(OptionTables, ItemValuesAndFormsAreDistinct) {
     std::set<int> values;
     std::set<std::string> forms;
@@ -292,42 +256,6 @@ TEST(OptionConflicts, LaterOptionWins) {
     quiet.no_conflicts = true;
     EXPECT_TRUE(parse(quiet, {"--use_g2", "--use_g3"}));
     EXPECT_TRUE(quiet.getopt(O::OO_use_g2) && quiet.getopt(O::OO_use_g3));
-}
-
-TEST(OptionState, ClearHistoryAndPersistence) {
-    O o;
-    EXPECT_TRUE(parse(o, {"-i5", "-x1", "-x2", "-v28", "-a"}));
-    EXPECT_EQ(o.events().size(), 5u);
-    o.clearopt(O::OO_aux_cmd_flag);
-    EXPECT_EQ(o.events().size(), 3u);
-    EXPECT_EQ(o.getargcount(O::OO_aux_cmd_flag), 0u);
-    testing::internal::CaptureStderr();
-    o.clearopt(O::OO_silicon_version);
-    EXPECT_NE(testing::internal::GetCapturedStderr().find("clear PERSISTENT option -v ignored"), std::string::npos);
-    EXPECT_STREQ(o.getstrarg(O::OO_silicon_version), "28");
-    EXPECT_TRUE(o.export_option_list(1).empty()) << "nothing was cleared and set again";
-    EXPECT_TRUE(parse(o, {"-x3"}));
-    EXPECT_EQ(o.export_option_list(1), std::vector<std::string>{"--aux_cmd_flag=3"});
-    o.setopt(99);
-    o.setopt(-1);
-    EXPECT_FALSE(o.getopt(99));
-    const O copy = o;
-    o.clearclassmembers(O::CLASS_ALL);
-    EXPECT_EQ(state(copy), "--aliased_variables --auto_inline=5 --aux_cmd_flag=3 --silicon_version=28");
-}
-
-TEST(OptionState, NumbersAsTextAndWrongKinds) {
-    O o;
-    o.setarg(O::OO_silicon_version, 27L);
-    o.setarg(O::OO_aux_cmd_flag, 4L);
-    EXPECT_STREQ(o.getstrarg(O::OO_silicon_version), "27");
-    EXPECT_STREQ(o.getstrarg(O::OO_aux_cmd_flag), "4");
-    EXPECT_EXIT(o.setarg(O::OO_single_inline, 4L), testing::ExitedWithCode(1), "unhandled clause in setarg");
-    EXPECT_EXIT(o.setarg(O::OO_auto_inline, "4"), testing::ExitedWithCode(1), "unhandled clause in setarg");
-    o.setarg(O::OO_opt_level, 999L);
-    std::string text;
-    EXPECT_TRUE(o.export_option(O::OO_opt_level, 0, &text));
-    EXPECT_EQ(text, "--opt_level=error");
 }
 
 TEST(OptionMerge, Policies) {
@@ -384,18 +312,6 @@ TEST(OptionHelp, ShowsEveryOptionOnce) {
     EXPECT_EQ(text.find(" \n"), std::string::npos) << "no blanks at line ends";
     EXPECT_EXIT(O().process_option("-usage", nullptr), testing::ExitedWithCode(0), "");
     EXPECT_EXIT(O().process_option("a?", nullptr), testing::ExitedWithCode(0), "");
-}
-
-TEST(Rot13, TurnsAndReusesItsBuffers) {
-    EXPECT_STREQ(O::rot13("-Opt_level=2%"), "%Bcg_yriry=2-");
-    EXPECT_STREQ(O::rot13(O::rot13("--Zz:")), "--Zz:");
-    EXPECT_STREQ(O::rot13(nullptr), "");
-    const char* const first = O::rot13("a");
-    for (const char* text : {"b", "c", "d", "e"}) O::rot13(text);
-    EXPECT_STREQ(first, "n") << "five results live";
-    O::rot13("f");
-    EXPECT_STREQ(first, "s") << "the sixth takes the place of the first";
-    EXPECT_EQ(std::strlen(O::rot13(std::string(500, 'a').c_str())), 500u);
 }
 
 } // namespace

@@ -1,36 +1,5 @@
 #include "fixture.h"
 
-class NarrowTypes : public Types {
-protected:
-    NarrowTypes() : Types(0) {}
-};
-
-TEST_F(Types, TargetSizes) {
-    struct {
-        TYPE* t;
-        unsigned size, align, rank;
-        bool is_signed, is_unsigned;
-    } const rows[] = {
-        {pkg.bool_t, 16, 16, 0, false, false}, {pkg.schar_t, 16, 16, 1, true, false},
-        {pkg.uchar_t, 16, 16, 1, false, true}, {pkg.wchar_t_, 32, 32, 1, false, false},
-        {pkg.short_t, 16, 16, 2, true, false}, {pkg.ushort_t, 16, 16, 2, false, true},
-        {pkg.int_t, 16, 16, 3, true, false},   {pkg.uint_t, 16, 16, 3, false, true},
-        {pkg.long_t, 32, 32, 4, true, false},  {pkg.ulong_t, 32, 32, 4, false, true},
-        {pkg.llong_t, 64, 32, 5, true, false}, {pkg.ullong_t, 64, 32, 5, false, true},
-    };
-    for (auto& r : rows) {
-        EXPECT_EQ(r.t->size, r.size) << r.t->printstr();
-        EXPECT_EQ(r.t->align, r.align);
-        EXPECT_EQ(r.t->rank(), int(r.rank));
-        EXPECT_EQ(r.t->is_signed(), r.is_signed);
-        EXPECT_EQ(r.t->is_unsigned(), r.is_unsigned);
-    }
-    EXPECT_EQ(pkg.double_t->size, 64u);
-    EXPECT_EQ(pkg.ldouble_t->align, 32u);
-    EXPECT_EQ(pkg.long_t->size_in_bytes(), 2u);
-    EXPECT_EQ(pkg.schar_t->size_in_bytes(), 1u);
-    EXPECT_EQ(pkg.void_ptr_t->size, 32u);
-}
 
 TEST_F(Types, NormalFormOfBasicTypes) {
     EXPECT_EQ(pkg.schar_t->normalized_type(), pkg.int_t);
@@ -45,14 +14,6 @@ TEST_F(Types, NormalFormOfBasicTypes) {
     // An integer of a layout that the package doesn't know may not change its size.
     TYPE* odd = pkg.mk_int(TYPE::ik_int, false, 24, 8, false, false);
     EXPECT_EQ(odd->normalized_type(), odd);
-}
-
-TEST_F(NarrowTypes, SizesOfTheOtherAbi) {
-    EXPECT_EQ(pkg.wchar_t_->size, 16u);
-    EXPECT_EQ(pkg.wchar_t_->normalized_type(), pkg.int_t);
-    EXPECT_EQ(pkg.double_t->size, 32u);
-    EXPECT_EQ(pkg.double_t->normalized_type(), pkg.float_t);
-    EXPECT_EQ(pkg.ldouble_t->normalized_type(), pkg.ldouble_t);
 }
 
 TEST_F(Types, NormalFormOfBuiltTypes) {
@@ -139,30 +100,6 @@ TEST_F(Types, ArraysAndVectors) {
     EXPECT_STREQ(error_code_name(pkg.error_code), "object size not supported");
 }
 
-TEST_F(Types, OtherSign) {
-    EXPECT_EQ(pkg.mk_unsigned(pkg.long_t), pkg.ulong_t);
-    EXPECT_EQ(pkg.mk_signed(pkg.uchar_t), pkg.schar_t);
-    EXPECT_EQ(pkg.mk_unsigned(pkg.uint_t), pkg.uint_t);
-    EXPECT_EQ(pkg.mk_unsigned(pkg.mk_qual(pkg.int_t, QUAL_CONST)), pkg.mk_qual(pkg.uint_t, QUAL_CONST));
-    EXPECT_EQ(pkg.mk_signed(pkg.mk_vector(pkg.ulong_t, false, 2)), pkg.mk_vector(pkg.long_t, false, 2));
-    EXPECT_EQ(pkg.mk_unsigned(pkg.wchar_t_)->size, 32u);
-    EXPECT_DIES(pkg.mk_signed(pkg.float_t), "Bad kind:  TYPE_PKG::mk_signed()");
-    TYPE* b = pkg.mk_boolean_int(pkg.int_t);
-    EXPECT_TRUE(b->is_bool());
-    EXPECT_NE(b, pkg.int_t);
-    EXPECT_EQ(b->normalized_type(), pkg.int_t);
-}
-
-TEST_F(Types, EnumsCountAsTheirUnderlyingType) {
-    TYPE* e = pkg.mk_enum("E", pkg.uint_t, 16, 16, false);
-    pkg.type_frozen(e);
-    EXPECT_TRUE(e->is_unsigned());
-    EXPECT_EQ(e->rank(), 3);
-    EXPECT_TRUE(e->is_arithmetic() && e->is_scalar() && e->is_udt());
-    EXPECT_EQ(c_integral_promotions(e), pkg.uint_t);
-    EXPECT_DIES(pkg.mk_enum("F", pkg.float_t, 16, 16, false), "Bad type:  TYPE_PKG::mk_enum()");
-}
-
 TEST_F(Types, UsualConversions) {
     struct {
         TYPE *a, *b, *result;
@@ -181,14 +118,6 @@ TEST_F(Types, UsualConversions) {
         EXPECT_EQ(c_usual_arith_conv(r.b, r.a), r.result);
     }
     EXPECT_DIES(c_usual_arith_conv(pkg.int_t, pkg.void_ptr_t), "Bad type:  c_usual_arith_conv()");
-}
-
-TEST_F(Types, WrongKinds) {
-    EXPECT_DIES(pkg.int_t->type_pointed_to(), "Bad kind:  TYPE::type_pointed_to()");
-    EXPECT_DIES(pkg.int_t->getr(TYPE::tpk_float), "Bad kind:  TYPE::getr()");
-    EXPECT_DIES(pkg.mk_qual(pkg.int_t, QUAL_CONST)->getd(TYPE::tpk_int), "Bad kind:  TYPE::getd()");
-    EXPECT_DIES(pkg.set_mdata(structure("S", nullptr), nullptr), "Modifying frozen type:  TYPE::check_nfrozen");
-    EXPECT_EQ(std::string(tp_failure("x").what()), "TP>> internal error: x");
 }
 
 TEST_F(Types, FlexibleArrayMembers) {

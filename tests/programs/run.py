@@ -1,9 +1,13 @@
 #!/usr/bin/env python3
 """Whole programs: each must print the same before and after optimization.
 
-Every tests/programs/NAME.c is parsed and executed, and must print NAME.expected. It is then optimized at every level
-and at both ends of the size goal, with the checker between steps, executed and compared. What was optimized is
-optimized once more: an output is a valid input, and must still print the same.
+Every tests/programs/NAME.c is parsed and executed, and must print what the sums in expected.txt are of. It is then
+optimized at every level and at both ends of the size goal, with the checker between steps, executed, and compared line
+by line with the run before. What was optimized is optimized once more: an output is a valid input, and must still print
+the same.
+
+A line of expected.txt is a program, how many lines it prints, and a sum of each SECTION of these. --accept writes the
+sums of what the chosen programs print unoptimized; crosscheck.py asks another compiler whether they are right.
 
 A program may begin with comments that say how it is built:
   // parse: WORD...      words for the parser; a file name with .c is a further file of the unit, in this folder
@@ -14,6 +18,7 @@ With --forms SEED each program is judged once a level as another parser might ha
 import argparse
 import sys
 import tempfile
+import zlib
 from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
 
@@ -24,6 +29,29 @@ from zbench import Outcome, Tools, Trouble, difference  # noqa: E402
 LEVELS = ("off", "0", "1", "2", "3", "4")
 SIZE_GOALS = ("0", "5")
 CHECK = "--debug:validate"
+EXPECTED = HERE / "expected.txt"
+SECTION = 16
+
+
+def sums(output):
+    """The words that stand for an output: the count of its lines, then the sum of each section of them."""
+    lines = output.splitlines(keepends=True)
+    return [str(len(lines))] + [f"{zlib.crc32(''.join(lines[at:at + SECTION]).encode()):08x}"
+                                for at in range(0, len(lines), SECTION)]
+
+
+def expectations():
+    """The sums by the names of programs."""
+    return {name: words for name, *words in (line.split() for line in EXPECTED.read_text().splitlines())}
+
+
+def unexpected(words, output):
+    """None when `output` has these sums, or one line that tells where it parts from them."""
+    got = sums(output)
+    for at, (left, right) in enumerate(zip(words[1:], got[1:])):
+        if left != right:
+            return f"lines {at * SECTION + 1} to {(at + 1) * SECTION}: sum {right} instead of {left}"
+    return None if got == words else f"{got[0]} lines instead of {words[0]}"
 
 
 def directives(source, key):
@@ -68,17 +96,18 @@ def judge_variant(tools, unit, want, name, words, rounds=("", " again")):
     return []
 
 
-def judge_program(tools, source, levels, folder, forms=None):
-    """All failures of one program, each a line of text; none when it passes."""
-    expected = source.with_suffix(".expected")
-    if not expected.exists():
-        return [f"{expected.name} is missing"]
-    want = Outcome(0, expected.read_text())
+def parsed(tools, source, folder, words=()):
+    """The unit of a program, and what it does unoptimized."""
     unit = Path(folder) / f"{source.stem}.if"
+    tools.parse(source, unit, [*parser_words(source), *words])
+    return unit, tools.execute(unit)
+
+
+def judge_program(tools, source, expected, levels, folder, forms=None):
+    """All failures of one program, each a line of text; none when it passes."""
     try:
-        words = [] if forms is None else ["--seed", f"{forms} {source.stem}"]
-        tools.parse(source, unit, parser_words(source) + words)
-        found = difference(want, tools.execute(unit))
+        unit, want = parsed(tools, source, folder, [] if forms is None else ["--seed", f"{forms} {source.stem}"])
+        found = difference(Outcome(0, want.output), want) or unexpected(expected, want.output)
     except Trouble as trouble:
         found = str(trouble)
     if found:
@@ -100,6 +129,15 @@ def chosen(only, shard):
     return programs[index::count]
 
 
+def accept(tools, programs):
+    """Writes what these programs print now as what they have to."""
+    known = {name: words for name, words in expectations().items() if (HERE / f"{name}.c").exists()}
+    with tempfile.TemporaryDirectory() as folder:
+        for source in programs:
+            known[source.stem] = sums(parsed(tools, source, folder)[1].output)
+    EXPECTED.write_text("".join(f"{' '.join([name, *words])}\n" for name, words in sorted(known.items())))
+
+
 def main():
     parser = argparse.ArgumentParser(description=__doc__.splitlines()[0])
     Tools.add_options(parser)
@@ -108,6 +146,7 @@ def main():
     parser.add_argument("--levels", default=" ".join(LEVELS), help="levels to optimize at (all)")
     parser.add_argument("--shard", default="0/1", metavar="INDEX/COUNT", help="a part of the programs, from 0/COUNT on")
     parser.add_argument("--forms", metavar="SEED", help="programs in other forms, at each level")
+    parser.add_argument("--accept", action="store_true", help="write expected.txt by the programs unoptimized")
     options = parser.parse_args()
     if options.forms is not None:
         options.icparse = HERE / "forms.py"
@@ -115,9 +154,13 @@ def main():
     programs = chosen(options.only, options.shard)
     if not programs:
         sys.exit("no program is chosen")
+    if options.accept:
+        return accept(tools, programs)
+    expected = expectations()
     failed = 0
     with tempfile.TemporaryDirectory() as folder, ThreadPoolExecutor(options.jobs) as pool:
-        results = pool.map(lambda source: judge_program(tools, source, levels, folder, options.forms), programs)
+        results = pool.map(lambda source: judge_program(tools, source, expected.get(source.stem, ["0"]), levels, folder,
+                                                        options.forms), programs)
         for source, failures in zip(programs, results):
             failed += bool(failures)
             for failure in failures:

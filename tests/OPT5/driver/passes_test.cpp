@@ -111,23 +111,4 @@ TEST(Steps, RandomOrdersArePermutations) {
     }
 }
 
-TEST(Steps, TimeReport) {
-    WORKPLACE w;
-    w.put("a.if", unit());
-    RESULT r = w.run({"--enable:time_stats", "a.if", "b.if"});
-    EXPECT_TRUE(contains(r.err, "\nTime for whole compilation unit:  ")) << r.err;
-    r = w.run({"a.if", "b.if"});
-    EXPECT_EQ(r.err, "");
-    r = w.run({"--enable:time_stats", "-#1", "a.if", "b.if"});
-    EXPECT_FALSE(contains(r.err, "Time for"));
-    EXPECT_TRUE(contains(w.get("a.odb"), "\nTime for whole compilation unit:  "));
-}
-
-TEST(Steps, MachineDescriptionCheckWritesNothing) {
-    WORKPLACE w;
-    w.put("a.if", unit());
-    EXPECT_EQ(w.run({"--debug:parser", "a.if", "b.if"}).status, 0);
-    EXPECT_FALSE(w.has("b.if"));
-}
-
 } // namespace

@@ -68,20 +68,6 @@ TEST_F(RunLoop, BarriersWaitForAllFunctions) {
     EXPECT_EQ(currfunc, nullptr);
 }
 
-TEST_F(RunLoop, NoStepsAtAll) {
-    run_functions(write_function);
-    EXPECT_EQ(trace, "Wa Wb Wc");
-}
-
-TEST_F(RunLoop, BarriersInARowAtBothEnds) {
-    add_barrier(barrier_1);
-    add_barrier(barrier_1);
-    add(step_1);
-    add_barrier(barrier_1);
-    run_functions(write_function);
-    EXPECT_EQ(trace, "B1 B1 1a 1b 1c B1 Wa Wb Wc");
-}
-
 TEST_F(RunLoop, SuppressedFunctionIsNotWritten) {
     add_barrier(put_c_to_sleep);
     add(step_3);

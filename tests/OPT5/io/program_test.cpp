@@ -116,20 +116,6 @@ TEST_F(ProgramTest, WhatPragmasKeepIsCompiled) {
     EXPECT_EQ(count(text, "return _object"), 1) << text;
 }
 
-TEST_F(ProgramTest, CallersComeBeforeWhatTheyCall) {
-    IC_SYMBOL* third = declare("_a_third");
-    IC_SYMBOL* second = declare("_b_second");
-    returns(third, icon(1));
-    returns(second, call(third));
-    begin_main();
-    ret(call(second));
-    end();
-    ASSERT_EQ(optimize({"--opt_level=2", "--disable_inlining"}).status, 0);
-    const std::string text = dump();
-    EXPECT_LT(text.find("function _main"), text.find("function _b_second")) << text;
-    EXPECT_LT(text.find("function _b_second"), text.find("function _a_third")) << text;
-}
-
 TEST_F(ProgramTest, RecursionIsFoundAlongCyclesAndThroughTheOutside) {
     IC_SYMBOL* outside = global("_outside", int_fn, 5);
     IC_SYMBOL* even = declare("_even");

@@ -22,18 +22,6 @@ TEST_F(ReadTest, CommentsAndInlineAssemblyKeepTheirPlace) {
     expect_no_line("hidden");
 }
 
-TEST_F(ReadTest, ABranchToTheLabelThatFollowsDisappears) {
-    begin_main();
-    set(x, icon(1));
-    go(7);
-    label(7);
-    ret(name(x));
-    end();
-    expect_lines({"x = 1", "return x"});
-    expect_no_line("goto");
-    expect_no_line("\nL");
-}
-
 TEST_F(ReadTest, CountedLoopsBecomeBranchesOnTheCounter) {
     begin_main();
     set(x, icon(3));
@@ -70,30 +58,6 @@ TEST_F(ReadTest, WithoutAnExceptionTableCallsHaveNoEntry) {
     ret(name(x));
     end();
     expect_lines({"x = _f()"});
-}
-
-TEST_F(ReadTest, IncrementsConditionsAndCommasForEffectAreSequenced) {
-    IC_SYMBOL* f = global("_f", int_fn, 5);
-    begin_main();
-    statement(node(op::PLUSPLUS, pkg.int_t, name(y), icon(1)));
-    statement(node(op::COMMAOP, pkg.int_t, node(op::ASG, pkg.int_t, name(x), icon(5)), call(f)));
-    statement(node(op::QUEST, pkg.int_t, name(x), node(op::COLON, pkg.int_t, call(f), node(op::ASG, pkg.int_t, name(y), icon(6)))));
-    statement(node(op::ANDAND, pkg.int_t, name(y), call(f)));
-    ret(name(x));
-    end();
-    expect_lines({"y += 1", "x = 5", "_f()", "if (!(!x)) goto L2", "y = 6", "goto L3", "L2:", "_f()", "L3:", "if (!(y)) goto L5",
-                  "_f()", "L5:", "return x"});
-}
-
-TEST_F(ReadTest, ShortCircuitConditionsAreOneBranchATest) {
-    begin_main();
-    IC_NODE* either = node(op::OROR, pkg.int_t, node(op::LT, pkg.int_t, name(x), icon(3)), node(op::GT, pkg.int_t, name(y), icon(4)));
-    unless(node(op::ANDAND, pkg.int_t, either, name(x)), 5);
-    set(x, icon(1));
-    label(5);
-    ret(name(x));
-    end();
-    expect_lines({"if (!(x >= 3)) goto L2", "if (!(y > 4)) goto L4", "L2:", "if (!(x)) goto L4", "x = 1", "L4:", "return x"});
 }
 
 // ---- Intrinsics

@@ -4,30 +4,6 @@ namespace {
 
 class CfgTest : public FunctionTest {};
 
-TEST_F(CfgTest, AnEmptyBodyIsABranchToTheExit) {
-    build();
-    EXPECT_EQ(currfuninfo->bb_count, 2);
-    EXPECT_EQ(currfuninfo->bb_list->branch()->op, BRANCH);
-    ASSERT_NE(currfuninfo->exit_bb, nullptr);
-    EXPECT_EQ(currfuninfo->exit_bb->branch()->op, URETURN);
-    EXPECT_TRUE(has_edge(currfuninfo->bb_list, currfuninfo->exit_bb));
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(CfgTest, ALabelAtTheVeryEndBranchesToTheExit) {
-    SYMTAB* x = local("x");
-    branch_if(x, 1, 2);
-    define(1);
-    assign(x, 3);
-    define(2);
-    build();
-    BBLK* last = block_of(2);
-    ASSERT_NE(last, nullptr);
-    EXPECT_TRUE(has_edge(last, currfuninfo->exit_bb));
-    EXPECT_TRUE(has_edge(block_of(1), last));
-    EXPECT_TRUE(valid());
-}
-
 TEST_F(CfgTest, ALoopAtTheStartLeavesTheEntryWithoutPredecessors) {
     SYMTAB* x = local("x");
     define(1);
@@ -272,11 +248,6 @@ TEST_F(DominatorTest, AnEditMakesTheNextQueryRebuild) {
     d().depth_first_doms([&](BBLK* bb) { seen.push_back(bb->dfn); });
     EXPECT_EQ(seen.size(), static_cast<size_t>(currfuninfo->bb_count));
     EXPECT_EQ(seen.front(), 1);
-}
-
-TEST_F(DominatorTest, ABlockNumberOutOfRangeEndsTheRun) {
-    diamond_in_a_loop();
-    EXPECT_EXIT(d().DFSblock(1000), testing::ExitedWithCode(1), "terminated abnormally");
 }
 
 } // namespace

@@ -26,11 +26,6 @@ TEST_F(SymbolTest, SplitClassifiesByClassAndType) {
     delete gone;
 }
 
-TEST_F(SymbolTest, AClassThatIsNoneEndsTheRun) {
-    local("x")->sclass = 0;
-    EXPECT_EXIT(sym_split(currfuninfo), testing::ExitedWithCode(1), "terminated abnormally");
-}
-
 TEST_F(SymbolTest, TemporariesAreNamedByLetterAndNumber) {
     SYMTAB* t = sym_temp('T', 12, tp->int_t, nullptr);
     SYMTAB* first = sym_temp('P', -1, tp->mk_qual(tp->long_t, QUAL_CONST), nullptr);
@@ -47,13 +42,6 @@ TEST_F(SymbolTest, TemporariesAreNamedByLetterAndNumber) {
     } cases[] = {{"$O$T12", true}, {"$O$T", true}, {"$O$L1", true}, {"$O$T12x", false}, {"$O$", false}, {"$O", false},
                  {"$P$T1", false}, {"$O$Q1", false}};
     for (const auto& c : cases) EXPECT_EQ(is_optimizer_temp(c.name, 'T', 'L'), c.expected) << c.name;
-}
-
-TEST_F(SymbolTest, AnEnumerationTemporaryIsAnInt) {
-    TYPE* color = tp->mk_enum("color", tp->int_t, 16, 16, false);
-    tp->set_etors(color, nullptr);
-    tp->type_frozen(color);
-    EXPECT_EQ(sym_temp('T', -1, color, nullptr)->type, tp->int_t);
 }
 
 TEST_F(SymbolTest, DeclarationsFindTheirDefinition) {
@@ -73,15 +61,6 @@ TEST_F(SymbolTest, DeclarationsFindTheirDefinition) {
     EXPECT_EQ(get_sym_def_for_decl(late_decl), late_def);
 }
 
-TEST_F(SymbolTest, ErrnoIsAnInt) {
-    SYMTAB* wrong = make_symbol("errno", tp->long_t, SC_EXTERN, 0);
-    SYMTAB* right = make_symbol("_errno", tp->int_t, SC_EXTERN, 0);
-    sym_def(wrong);
-    EXPECT_EQ(errno_symbol, nullptr);
-    sym_def(right);
-    EXPECT_EQ(errno_symbol, right);
-}
-
 TEST_F(SymbolTest, NamePrefixFollowsTheAbi) {
     EXPECT_STREQ(skip_name_prefix("_main"), "main");
     EXPECT_STREQ(skip_name_prefix(".main"), "main");
@@ -89,23 +68,6 @@ TEST_F(SymbolTest, NamePrefixFollowsTheAbi) {
     TYPE_PKG::abi = 1;
     EXPECT_STREQ(skip_name_prefix("_main"), "_main");
     TYPE_PKG::abi = 0;
-}
-
-TEST_F(SymbolTest, PragmasAreRemovedOneByOne) {
-    SYMTAB* x = local("x");
-    for (int kind : {5, 7, 5}) {
-        auto* p = new PRAGMA;
-        p->kind = static_cast<uint8_t>(kind);
-        p->next = x->pragma;
-        x->pragma = p;
-    }
-    remove_pragma(5, &x->pragma);
-    EXPECT_EQ(x->sym_prag_num(), 2);
-    EXPECT_NE(find_pragma(x, 5), nullptr);
-    remove_pragma(5, &x->pragma);
-    EXPECT_EQ(find_pragma(x, 5), nullptr);
-    remove_pragma(5, &x->pragma);
-    EXPECT_EQ(x->sym_prag_num(), 1);
 }
 
 // ---- Initial values
@@ -200,18 +162,6 @@ TEST_F(AutoinitTest, AStringFillsItsArray) {
 
 class FuninfoTest : public SymbolTest {};
 
-TEST_F(FuninfoTest, ARecordMadeByNameIsKeyedToItsSymbolLater) {
-    FUNINFO* f = make_FUNINFO("later");
-    SYMTAB* sym = make_symbol("_later", function_type(), SC_EXTERN, 0);
-    EXPECT_EQ(make_FUNINFO(sym), f);
-    EXPECT_EQ(f->symbol, sym);
-    EXPECT_EQ(find_FUNINFO(sym), f);
-    EXPECT_EQ(find_FUNINFO("later"), f);
-    // A second function of that name, of another unit, has a record of its own.
-    SYMTAB* twin = make_symbol("_later", function_type(), SC_STATIC, 0);
-    EXPECT_NE(make_FUNINFO(twin), f);
-}
-
 TEST_F(FuninfoTest, SystemFunctionsAreKnownByName) {
     EXPECT_EQ(find_FUNINFO("xyz_unknown"), nullptr);
     FUNINFO* abs = find_FUNINFO("abs");
@@ -270,19 +220,6 @@ TEST_F(FuninfoTest, UnsuppressionBringsAFunctionBackOnce) {
     EXPECT_TRUE(unsuppressed_functions.empty());
 }
 
-TEST_F(FuninfoTest, AFinishedBodyLeavesTheRecord) {
-    SYMTAB* x = local("x");
-    assign(x, 1);
-    ret(x);
-    build();
-    set_flags(currfuninfo, FUN_has_1_BB);
-    erase_all();
-    EXPECT_EQ(currfuninfo->bb_list, nullptr);
-    EXPECT_EQ(currfuninfo->scalar_syms, nullptr);
-    EXPECT_EQ(currfuninfo->ls_root, nullptr);
-    EXPECT_TRUE(TEST_FLAG(currfuninfo, FUN_has_1_BB));
-}
-
 // ---- Scopes
 
 TEST_F(SymbolTest, ScopesNestAndHoldTheirSymbolsInOrder) {
@@ -309,21 +246,6 @@ TEST_F(SymbolTest, ScopesNestAndHoldTheirSymbolsInOrder) {
     EXPECT_FALSE(LS::object_may_be_live_in_scope(c, sibling));
     EXPECT_TRUE(LS::object_may_be_live_in_scope(a, sibling));
     currfuninfo->ls_root->validate();
-}
-
-TEST_F(SymbolTest, PointerRecordsAreOneASymbolAndMember) {
-    SYMTAB* p = local("p", tp->mk_qual(tp->mk_ptr(tp->int_t), QUAL_RESTRICT));
-    SYMTAB* x = local("x");
-    PTR* record = find_or_make_PTR_entry(p);
-    ASSERT_NE(record, nullptr);
-    EXPECT_EQ(find_or_make_PTR_entry(p), record);
-    EXPECT_TRUE(record->flags & PTR_IS_RESTRICTED);
-    EXPECT_FALSE(record->flags & (PTR_IS_FILE_LEVEL | PTR_IS_BOTTOM));
-    EXPECT_EQ(find_or_make_PTR_entry(x), nullptr);
-    NODE* through = maketree(UMULT, maketree(UAND, mk_NAME(p), nullptr, tp->mk_ptr(p->type)), nullptr, p->type);
-    EXPECT_EQ(find_or_make_PTR_entry(through), record);
-    erase_tree(through);
-    EXPECT_EQ(currfuninfo->bottom_ptr->flags, PTR_IS_A_ROOT | PTR_IS_BOTTOM);
 }
 
 } // namespace

@@ -58,15 +58,6 @@ TEST_F(TreeNode, IconTakesTheSignOfItsType) {
     }
 }
 
-TEST_F(TreeNode, SmallIntegerReadersRefuseWhatDoesNotFit) {
-    NODE* t = icon(-1);
-    EXPECT_EQ(t->icon_svalue(), -1);
-    EXPECT_EXIT(t->icon_uvalue(), testing::ExitedWithCode(1), "");
-    t->u.lval = INT65(0x100000000);
-    EXPECT_EXIT(t->icon_uvalue(), testing::ExitedWithCode(1), "");
-    EXPECT_EXIT(t->icon_svalue(), testing::ExitedWithCode(1), "");
-}
-
 TEST_F(TreeNode, LconKeepsSixtyFourBitsBothWays) {
     for (const char* text : {"18446744073709551615", "9223372036854775808", "0"}) {
         NODE* t = new_node(LCON, tp->ullong_t);
@@ -114,25 +105,6 @@ TEST_F(TreeNode, FconTextLosesNothing) {
         }
 }
 
-TEST_F(TreeNode, EnumCastsAndCharPointers) {
-    TYPE* e = tp->mk_enum("color", tp->uint_t, 16, 16, false);
-    tp->type_frozen(e);
-    EXPECT_TRUE(un(SCONV, icon(1), e)->type->is_ikind(TYPE::ik_uint));
-    TYPE* volatile_int = tp->mk_qual(tp->int_t, QUAL_VOLATILE);
-    EXPECT_FALSE(un(SCONV, icon(1), volatile_int)->type->is_volatile());
-    NODE* p = name(symbol("p", tp->mk_ptr(tp->int_t)));
-    EXPECT_EQ(un(PCONV, p, tp->mk_ptr(tp->schar_t))->op, ISP2CHAR);
-    EXPECT_EQ(un(PCONV, p, tp->mk_ptr(tp->long_t))->op, PCONV);
-}
-
-TEST_F(TreeNode, CallsAreNotedInTheFunction) {
-    currfuninfo->no_calls = true;
-    maketree(CALL, icon(1), nullptr, tp->int_t);
-    EXPECT_TRUE(currfuninfo->no_calls);
-    maketree(UCALL, icon(1), nullptr, tp->int_t);
-    EXPECT_FALSE(currfuninfo->no_calls);
-}
-
 TEST_F(TreeNode, CopiesOwnTheirPayload) {
     NODE* s = new_node(SCON, tp->mk_ptr(tp->schar_t));
     s->mk_scon("a\0b", 3);
@@ -144,24 +116,6 @@ TEST_F(TreeNode, CopiesOwnTheirPayload) {
     EXPECT_EQ(0, memcmp(c->left->left->scon_value(), "a\0b", 3));
     EXPECT_STREQ(c->right->icall_name(), "g");
     erase_tree(c);
-}
-
-TEST_F(TreeNode, ScopeIsKeptOrLeftBehind) {
-    LS scope;
-    NODE* t = un(UMINUS, name(symbol("x", tp->int_t)));
-    t->ls = t->left->ls = &scope;
-    NODE *with = copy_tree(t), *without = copy_tree(t, false);
-    EXPECT_EQ(with->left->ls, &scope);
-    EXPECT_EQ(without->left->ls, nullptr);
-    EXPECT_EQ(copy_node_if_changed(t, t->left, nullptr), t);
-}
-
-TEST_F(TreeNode, ErasingADupeLeavesTheOriginal) {
-    NODE* original = icon(7);
-    NODE* dupe = maketree(CSE_DUPE, nullptr, original, tp->int_t);
-    erase_tree(bin(PLUS, dupe, icon(1)));
-    EXPECT_EQ(original->op, ICON);
-    erase_tree(original);
 }
 
 #ifndef __SANITIZE_ADDRESS__
@@ -184,16 +138,6 @@ TEST_F(TreeNode, SharedNodesAreReported) {
     EXPECT_NE(testing::internal::GetCapturedStderr().find("(ICON) is shared\n"), std::string::npos);
     list->rest->first->left = icon(1);
     EXPECT_EQ(report_shared_nodes(list), 0);
-}
-
-TEST_F(TreeNode, DeepTreesLeanLeft) {
-    NODE* t = icon(0);
-    for (int i = 0; i < 200000; ++i) t = bin(PLUS, t, icon(1), tp->int_t);
-    NODE* c = copy_tree(t);
-    EXPECT_EQ(count_nodes_in_tree(c), 400001);
-    EXPECT_FALSE(tree_has_side_effects(c));
-    erase_tree(c);
-    erase_tree(t);
 }
 
 TEST_F(TreeNode, InfixText) {

@@ -17,16 +17,6 @@ protected:
     NODE* C() { return name(c); }
 };
 
-TEST_F(TreeQuery, ArgumentsAreCountedFromTheDeepestLeft) {
-    NODE* list = arg_list_append(arg_list_append(arg_list_append(nullptr, icon(10)), icon(11)), icon(12));
-    EXPECT_EQ(arg_list_count(list), 3);
-    for (int i = 0; i < 3; ++i) EXPECT_EQ(arg_list_lookup(list, i)->u.lval, INT65(10 + i));
-    EXPECT_EQ(arg_list_lookup(list, 3), nullptr);
-    EXPECT_EQ(arg_list_lookup(icon(5), 0)->u.lval, INT65(5));
-    EXPECT_EQ(arg_list_lookup(icon(5), 1), nullptr);
-    EXPECT_EQ(arg_list_count(nullptr), 0);
-}
-
 TEST_F(TreeQuery, SideEffects) {
     struct {
         NODE* tree;
@@ -183,13 +173,6 @@ TEST_F(TreeQuery, SubstitutionsSpareLvalues) {
     EXPECT_EQ(show(subst_tree_for_lvalue_in_tree(B(), A(), t)), "b = 5 + &b");
     EXPECT_EQ(show(subst_sym_for_sym_in_tree(b, c, t)), "c = 5 + &c");
     EXPECT_EQ(show(expunge_IDENTITY_ops_from_tree(un(IDENTITY, un(UMINUS, un(IDENTITY, un(IDENTITY, A())))))), "-a");
-}
-
-TEST_F(TreeQuery, CommaOperatorsBecomeStatements) {
-    LIST* list = mkelist(mk_COMMAOP(mk_COMMAOP(icon(1), icon(2)), icon(3)), nullptr, nullptr);
-    promote_toplevel_COMMAOPs_in_list(list);
-    for (int i = 1; i <= 3; ++i, list = list->rest) EXPECT_EQ(list->first->u.lval, INT65(i));
-    EXPECT_EQ(list, nullptr);
 }
 
 } // namespace

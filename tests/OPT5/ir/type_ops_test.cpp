@@ -1,6 +1,6 @@
 // The C type rules, casts, and the shapes of types.
 
-#include "evaluator.h"
+#include "tree_builder.h"
 
 #include <cstring>
 
@@ -12,46 +12,6 @@ class TypeOps : public Trees {
 protected:
     void TearDown() override { kr_flag = 0; }
 };
-
-TEST_F(TypeOps, PromotionAndCombination) {
-    EXPECT_EQ(promoted_type(tp->ushort_t), tp->uint_t);
-    EXPECT_EQ(promoted_type(tp->uchar_t), tp->uint_t);
-    EXPECT_EQ(promoted_type(tp->schar_t), tp->int_t);
-    EXPECT_EQ(promoted_type(tp->wchar_t_), tp->ulong_t); // wider than `int` here
-    EXPECT_EQ(promoted_type(tp->mk_qual(tp->long_t, QUAL_CONST)), tp->long_t);
-    struct {
-        TYPE *a, *b, *combined;
-    } cases[] = {
-        {tp->long_t, tp->uint_t, tp->long_t},        {tp->int_t, tp->uint_t, tp->uint_t},
-        {tp->ulong_t, tp->long_t, tp->ulong_t},      {tp->llong_t, tp->ulong_t, tp->llong_t},
-        {tp->float_t, tp->ullong_t, tp->float_t},    {tp->double_t, tp->float_t, tp->double_t},
-        {tp->schar_t, tp->bool_t, tp->int_t},        {tp->void_ptr_t, tp->int_t, tp->void_ptr_t},
-        {tp->int_t, tp->void_ptr_t, tp->void_ptr_t},
-    };
-    for (const auto& c : cases)
-        EXPECT_EQ(combined_type_for_types(c.a, c.b), c.combined) << c.a->printstr() << c.b->printstr();
-    kr_flag = 1;
-    EXPECT_EQ(combined_type_for_types(tp->long_t, tp->uint_t), tp->ulong_t);
-}
-
-TEST_F(TypeOps, WiderTypes) {
-    EXPECT_EQ(next_wider_type(tp->uint_t), tp->long_t);
-    EXPECT_EQ(next_wider_type(tp->long_t), tp->llong_t);
-    EXPECT_EQ(next_wider_type(tp->float_t), tp->double_t);
-    EXPECT_EQ(type_for_PMCONV(tp->uint_t), tp->long_t);
-    EXPECT_EQ(type_for_PMCONV(tp->llong_t), tp->long_t);
-    EXPECT_EQ(wide_enough_int_type(INT65(32767)), tp->int_t);
-    EXPECT_EQ(wide_enough_int_type(INT65(40000)), tp->uint_t);
-    EXPECT_EQ(wide_enough_int_type(INT65(-40000)), tp->long_t);
-    EXPECT_EQ(max_scalar_alignment, 32u);
-    EXPECT_EQ(max_scalar_stride, 128u); // complex double
-}
-
-TEST_F(TypeOps, ComplexOfWhatHasNone) {
-    EXPECT_EXIT(get_complex_type(tp->uint_t), testing::ExitedWithCode(1), "part_type is not valid");
-    NODE* z = name(symbol("z", tp->mk_complex(tp->float_t)));
-    EXPECT_EXIT(coerce_to_type(tp->float_t, z), testing::ExitedWithCode(1), "");
-}
 
 TEST_F(TypeOps, Coercion) {
     SYMTAB *i = symbol("i", tp->int_t), *l = symbol("l", tp->long_t), *s = symbol("s", sample_struct());
@@ -151,67 +111,6 @@ TEST_F(TypeOps, ComparisonsTakeTheSignOfTheirType) {
     EXPECT_EQ(insert_mandatory_casts(bin(LT, name(p), name(p)))->op, ULT);
     EXPECT_EQ(insert_mandatory_casts(bin(LT, name(i), fcon("1")))->op, FLT);
     EXPECT_EQ(show(insert_mandatory_casts(bin(EQ, name(p), icon(0)))), "p == (int *)0");
-}
-
-void expect_operands_have_computing_type(const NODE* t) {
-    switch (t->op) {
-    case PLUS:
-    case MINUS:
-    case MULT:
-    case DIV:
-    case MOD:
-    case ANDB:
-    case ORB:
-    case XORB: ASSERT_TRUE(equiv_mtypes(t->right->type, t->type)) << show(t); [[fallthrough]];
-    case SLL:
-    case SRL:
-    case UMINUS:
-    case NOTB:
-    case ABS: ASSERT_TRUE(equiv_mtypes(t->left->type, t->type)) << show(t); break;
-    }
-    if (op_is_int_compare(t->op) || op_is_float_compare(t->op)) {
-        ASSERT_TRUE(equiv_mtypes(t->left->type, t->right->type)) << show(t);
-    }
-    if (t->left) expect_operands_have_computing_type(t->left);
-    if (t->right) expect_operands_have_computing_type(t->right);
-}
-
-// No cast that is put in changes a value, in expressions of all types and in every form of assignment.
-TEST_F(TypeOps, InsertedCastsKeepValues) {
-    TREE_MAKER make(20261);
-    EVALUATOR env;
-    for (TYPE* t : make.types) make.variables.push_back(symbol("x", t));
-    int defined = 0;
-    static const int stores[] = {ASG, ASG, PLUSASG, MINUSASG, MULTASG, DIVASG};
-    for (int round = 0; round < 20000; ++round) {
-        for (SYMTAB* s : make.variables) {
-            NODE* c = make.constant(s->type);
-            env.variables[s] = env.eval(c);
-            erase_tree(c);
-        }
-        NODE* t = make.expression(4);
-        if (round % 2) {
-            SYMTAB* x = make.variables[make.pick(static_cast<unsigned>(make.variables.size()))];
-            t = bin(stores[make.pick(6)], name(x), t, x->type);
-        }
-        EVALUATOR before = env, after = env;
-        std::string text = show(t);
-        VALUE expected = before.eval(t);
-        t = insert_mandatory_casts(t);
-        if (!expected.undefined) {
-            ++defined;
-            VALUE got = after.eval(t);
-            ASSERT_EQ(got, expected) << text << " -> " << show(t);
-            for (SYMTAB* s : make.variables)
-                ASSERT_EQ(after.variables[s], before.variables[s]) << text << " -> " << show(t);
-        }
-        expect_operands_have_computing_type(t);
-        std::string once = show(t);
-        t = insert_mandatory_casts(t);
-        ASSERT_EQ(show(t), once) << text;
-        erase_tree(t);
-    }
-    EXPECT_GT(defined, 8000);
 }
 
 TEST_F(TypeOps, TruthValues) {

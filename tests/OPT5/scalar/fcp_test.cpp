@@ -67,38 +67,6 @@ TEST_F(FcpTest, TheExtentOfAnArrayKeepsItsVariable) {
     a->size_tree = nullptr;
 }
 
-TEST_F(FcpTest, ChainsAreFollowedFromRoundToRound) {
-    SYMTAB *x = local("x"), *y = local("y"), *z = local("z"), *w = local("w");
-    set(z, fresh());
-    set(y, mk_NAME(z));
-    set(x, mk_NAME(y));
-    set(w, maketree(MULT, mk_NAME(x), mk_NAME(y), tp->int_t));
-    ret(w);
-    build();
-    fast_CP(4, 0);
-    EXPECT_TRUE(says("w = z * z")) << text();
-    EXPECT_FALSE(says("x") || says("y")) << text();
-}
-
-TEST_F(FcpTest, CopiesOfWhatChangesStay) {
-    SYMTAB *x = local("x"), *y = local("y"), *c = local("c");
-    set(c, fresh());
-    define(1);
-    set(x, fresh()); // once in the text, but in a loop
-    branch_if(c, 2, 3);
-    define(2);
-    set(y, mk_NAME(x));
-    define(3);
-    set(c, maketree(PLUS, mk_NAME(y), mk_NAME(x), tp->int_t));
-    branch_if(c, 1, 4);
-    define(4);
-    ret(y);
-    build();
-    fast_CP(4, 0);
-    EXPECT_TRUE(says("y = x")) << text();
-    EXPECT_TRUE(says("c = y + x")) << text();
-}
-
 TEST_F(FcpTest, AnEntryThatALoopReturnsToRunsMoreThanOnce) {
     SYMTAB *x = local("x"), *y = local("y"), *c = local("c");
     define(1);

@@ -19,83 +19,10 @@ protected:
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) ++n;
         return n;
     }
-    void call(const char* name) {
-        SYMTAB* f = make_symbol(name, function_type(), SC_EXTERN, 0);
-        add(maketree(UCALL, maketree(UAND, mk_NAME(f), nullptr, tp->mk_ptr(f->type)), nullptr, tp->int_t));
-    }
     NODE* constant_case(long value, int to) {
         return maketree(CASE, mk_ICON(INT65(value), tp->int_t), ref(to), tp->int_t);
     }
 };
-
-TEST_F(SimpcfgTest, StraightLinesBecomeOneBlock) {
-    SYMTAB* x = local("x");
-    assign(x, 1);
-    go(1);
-    define(1);
-    assign(x, 2);
-    define(2);
-    ret(x);
-    build();
-    simpcfg(false, false);
-    EXPECT_EQ(blocks(), 1);
-    EXPECT_EQ(currfuninfo->bb_list->branch()->op, RETURN);
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(SimpcfgTest, AConstantTestIsDecidedAndTheOtherSideGoes) {
-    SYMTAB* x = local("x");
-    add(mk_IF(mk_ICON(INT65(0), tp->int_t), ref(1), ref(2)));
-    define(1);
-    assign(x, 1);
-    define(3);
-    call("g");
-    go(3); // a ring that nothing enters any more
-    define(2);
-    ret(x);
-    build();
-    simpcfg(false, false);
-    EXPECT_EQ(blocks(), 1);
-    EXPECT_EQ(block_of(3), nullptr);
-    EXPECT_TRUE(valid());
-}
-
-class ConstantSwitchTest : public SimpcfgTest, public testing::WithParamInterface<std::pair<long, long>> {};
-INSTANTIATE_TEST_SUITE_P(Values, ConstantSwitchTest,
-                         testing::Values(std::pair(5L, 100L), std::pair(-1L, 200L), std::pair(6L, 300L)));
-
-TEST_P(ConstantSwitchTest, GoesToItsCaseOrToTheDefault) {
-    const auto [value, result] = GetParam();
-    SYMTAB* x = local("x");
-    NODE* cases = maketree(COMMA, maketree(COMMA, constant_case(5, 1), constant_case(-1, 2), tp->int_t),
-                           maketree(DEFAULT, ref(3), nullptr, tp->int_t), tp->int_t);
-    add(maketree(SWITCH, mk_ICON(INT65(value), tp->int_t), cases, tp->int_t));
-    for (int n = 1; n <= 3; ++n) {
-        define(n);
-        assign(x, 100 * n);
-        ret(x);
-    }
-    build();
-    simpcfg(false, false);
-    ASSERT_EQ(blocks(), 1);
-    EXPECT_EQ(currfuninfo->bb_list->statements->first->right->u.lval, INT65(result));
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(SimpcfgTest, ATestWithOneTargetKeepsTheEffectsOfItsCondition) {
-    SYMTAB* x = local("x");
-    add(mk_IF(mk_ASG(mk_NAME(x), mk_ICON(INT65(3), tp->int_t)), ref(1), ref(2)));
-    define(2);
-    go(1);
-    define(1);
-    ret(x);
-    build();
-    simpcfg(false, false);
-    ASSERT_EQ(blocks(), 1);
-    EXPECT_EQ(currfuninfo->bb_list->statements->first->op, ASG);
-    EXPECT_EQ(currfuninfo->bb_list->statements->rest->first->op, RETURN);
-    EXPECT_TRUE(valid());
-}
 
 TEST_F(SimpcfgTest, ALoopThatDoesNothingStays) {
     SYMTAB* x = local("x");
@@ -154,20 +81,6 @@ TEST_F(SimpcfgTest, CasesAlongAChainOfJumpsAllReachItsEnd) {
             EXPECT_EQ(ref->lbl->bblock, end) << "case " << n;
         }
     });
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(SimpcfgTest, TheFirstStatementsOfALoopDoNotJoinTheEntry) {
-    SYMTAB* x = local("x");
-    define(1);
-    assign(x, 1);
-    branch_if(x, 1, 2);
-    define(2);
-    ret(x);
-    build();
-    simpcfg(true, false);
-    EXPECT_EQ(currfuninfo->bb_list->predecessors, nullptr);
-    EXPECT_TRUE(has_edge(block_of(1), block_of(1)));
     EXPECT_TRUE(valid());
 }
 

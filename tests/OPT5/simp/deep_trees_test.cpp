@@ -1,6 +1,6 @@
 // Trees as large as generated programs have them: the simplifier ends, does not run out of stack, and gives the value.
 
-#include "../ir/evaluator.h"
+#include "../ir/tree_builder.h"
 
 #include "OPT5/simp/simp.h"
 

@@ -1,7 +1,7 @@
 // Rules of the simplifier that are not expressions of C: effects, built-in functions, vectors and complex values,
 // memory, structures, and the operations that other passes call.
 
-#include "../ir/evaluator.h"
+#include "../ir/tree_builder.h"
 
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
@@ -41,11 +41,12 @@ protected:
         NODE* tree;
         const char* expected;
     };
-    template <std::size_t N>
-    static void check(const ROW (&rows)[N]) {
+    static NODE* simplified(NODE* t) { return simp_tree(t, nullptr); }
+    template <std::size_t N, class OPERATION = NODE* (*)(NODE*)>
+    static void check(const ROW (&rows)[N], OPERATION operation = simplified) {
         for (const ROW& row : rows) {
             const std::string before = show(row.tree);
-            NODE* t = simp_tree(row.tree, nullptr);
+            NODE* t = operation(row.tree);
             EXPECT_EQ(show(t), row.expected) << before;
             erase_tree(t);
         }
@@ -219,10 +220,7 @@ TEST_F(Families, RelaxedFloatingPointAndPowers) {
 TEST_F(Families, TermsAreBroughtToTheTop) {
     NODE* target = x();
     auto bits = [](NODE* a) { return bin(ANDB, a, icon(7)); };
-    struct CASE {
-        NODE* tree;
-        const char* expected;
-    } cases[] = {
+    const ROW rows[] = {
         {bin(PLUS, y(), x()), "x + y"},
         {bin(PLUS, bin(PLUS, bits(y()), x()), bits(name(zs))), "x + ((y & 7) + (z & 7))"},
         {bin(MINUS, bin(MINUS, x(), bits(y())), bits(name(zs))), "x - ((y & 7) + (z & 7))"},
@@ -232,21 +230,13 @@ TEST_F(Families, TermsAreBroughtToTheTop) {
         {bin(MINUS, y(), x()), "y - x"},
         {bin(PLUS, f(), x()), "f() + x"},
     };
-    for (CASE& c : cases) {
-        const std::string before = show(c.tree);
-        c.tree = bubble_term_to_top(c.tree, target);
-        EXPECT_EQ(show(c.tree), c.expected) << before;
-        erase_tree(c.tree);
-    }
+    check(rows, [&](NODE* t) { return bubble_term_to_top(t, target); });
     erase_tree(target);
 }
 
 TEST_F(Families, ChainsAreReassociated) {
     auto sum = [](NODE* a, NODE* b) { return bin(PLUS, a, b); };
-    struct CASE {
-        NODE* tree;
-        const char* expected;
-    } cases[] = {
+    const ROW rows[] = {
         {sum(sum(sum(x(), y()), icon(3)), sum(x(), icon(4))), "(int)((unsigned int)x * 2u + (unsigned int)y + 7u)"},
         {bin(MINUS, sum(sum(x(), y()), name(zs)), x()), "y + z"},
         {bin(XORB, bin(XORB, bin(XORB, x(), y()), name(zs)), y()), "x ^ z"},
@@ -255,12 +245,7 @@ TEST_F(Families, ChainsAreReassociated) {
         {sum(sum(x(), y()), name(zs)), "x + y + z"},
         {sum(sum(f(), icon(1)), icon(2)), "f() + 1 + 2"},
     };
-    for (CASE& c : cases) {
-        const std::string before = show(c.tree);
-        c.tree = simp_assoc(c.tree, nullptr);
-        EXPECT_EQ(show(c.tree), c.expected) << before;
-        erase_tree(c.tree);
-    }
+    check(rows, [&](NODE* t) { return simp_assoc(t, nullptr); });
 }
 
 TEST_F(Families, OnlyTheBitsThatMatterAreComputed) {
@@ -287,21 +272,13 @@ TEST_F(Families, OnlyTheBitsThatMatterAreComputed) {
 
 TEST_F(Families, AddressesAndCopiesOfStructures) {
     SYMTAB *ss = symbol("s", sample_struct()), *sp = symbol("q", tp->mk_ptr(sample_struct()));
-    struct CASE {
-        NODE* tree;
-        const char* expected;
-    } cases[] = {
+    const ROW rows[] = {
         {name(ss), "&s"},
         {deref(name(sp)), "q"},
         {bin(COMMAOP, f(), name(ss), sample_struct()), "f(), &s"},
         {bin(QUEST, x(), bin(COLON, name(ss), deref(name(sp)), sample_struct()), sample_struct()), "x ? &s : q"},
     };
-    for (CASE& c : cases) {
-        const std::string before = show(c.tree);
-        c.tree = apply_UAND_to_struct(c.tree);
-        EXPECT_EQ(show(c.tree), c.expected) << before;
-        erase_tree(c.tree);
-    }
+    check(rows, [&](NODE* t) { return apply_UAND_to_struct(t); });
 
     TYPE* two = tp->mk_struct("two", 32, 16, false);
     fkMDATA* a = new fkMDATA("a", tp->int_t, 0, 0, 0, false, false, false, false);

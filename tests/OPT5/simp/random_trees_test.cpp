@@ -85,6 +85,36 @@ TEST(RandomTrees, OperatorsOnBoundaries) {
     }
 }
 
+// (x op1 c1) op2 c2, and with c2 on the left.
+TEST(RandomTrees, PairsOfOperatorsWithBoundaries) {
+    const int ops[] = {PLUS, MINUS, MULT, DIV, MOD, ANDB, ORB, XORB, SLL, SRL, EQ, LT, GE};
+    auto is_shift = [](int op) { return op == SLL || op == SRL; };
+    auto simplifies = [](NODE* t) {
+        const FINDING f = TRIAL(t, 1, 8).check(operations[0]);
+        EXPECT_FALSE(f) << f.what << "\n  tree   " << f.before << "\n  result " << f.after << "\n  with   " << f.contents;
+        erase_tree(t);
+    };
+    for (SYMTAB* x : world().integers) {
+        TYPE* type = x->type;
+        if (promoted_type(type) != type) continue;
+        auto right = [&](int op, INT65 c) {
+            return is_shift(op) ? constant(INT65(c.value & (type->size - 1)), tp->int_t) : constant(c, type);
+        };
+        for (int op1 : ops)
+            for (int op2 : ops)
+                for (INT65 c1 : boundaries(type))
+                    for (INT65 c2 : boundaries(type)) {
+                        if (op_is_int_compare(op1)) continue;
+                        const bool compares = op_is_int_compare(op2);
+                        const int own = op2 >= LE && compares && type->is_unsigned() ? op2 + (ULE - LE) : op2;
+                        TYPE* result = compares ? tp->int_t : type;
+                        auto inner = [&] { return maketree(op1, mk_NAME(x), right(op1, c1), type); };
+                        simplifies(maketree(own, inner(), right(op2, c2), result));
+                        if (!is_shift(op2)) simplifies(maketree(own, constant(c2, type), inner(), result));
+                    }
+    }
+}
+
 TEST(RandomTrees, CastsOfBoundaries) {
     const WORLD& w = world();
     for (SYMTAB* x : w.integers)

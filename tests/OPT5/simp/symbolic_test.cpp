@@ -460,38 +460,4 @@ TEST_F(Symbolic, TreesInARange) {
     }
 }
 
-// A question costs no more for a tree of any size; deep trees do not end the run.
-TEST_F(Symbolic, DeepTrees) {
-    NODE *sum = low(x(), 7), *selects = low(x(), 7);
-    for (int i = 0; i < 20000; ++i) {
-        sum = bin(PLUS, sum, low(y(), 1));
-        selects = choose(lt(x(), c(i)), c(i), selects);
-    }
-    for (NODE* t : {sum, selects}) {
-        for (NODE* node = t; node->left; node = node->op == QUEST ? node->right->right : node->left) {
-            tree_is_non_zero(node, nullptr);
-            max_ICON_factor(node, nullptr);
-            if (node->op == ANDB) break;
-        }
-        EXPECT_FALSE(tree_is_zero(t, nullptr));
-        erase_tree(t);
-    }
-}
-
-TEST_F(Symbolic, Helpers) {
-    EXPECT_EQ(clp2(0), 0u);
-    EXPECT_EQ(clp2(1), 1u);
-    EXPECT_EQ(clp2(40), 64u);
-    EXPECT_EQ(clp2(0x80000000u), 0x80000000u);
-    EXPECT_EQ(clp2(0x80000001u), 0u);
-    EXPECT_EQ(uint_gcd(12, 18), 6u);
-    EXPECT_EQ(uint_gcd(0, 5), 5u);
-    EXPECT_EQ(uint_lcm(4, 6), 12u);
-    EXPECT_EQ(uint_lcm(0, 6), 0u);
-    EXPECT_EQ(uint_lcm(0xFFFFFFFFu, 2), 0u);
-    EXPECT_EQ(compare_SLLONG_values(INT65(65535), INT65(1), tp->int_t), -1);
-    EXPECT_EQ(compare_SLLONG_values(INT65(65535), INT65(1), tp->uint_t), 1);
-    EXPECT_EQ(compare_SLLONG_values(INT65(65537), INT65(1), tp->uint_t), 0);
-}
-
 } // namespace

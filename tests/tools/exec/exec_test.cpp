@@ -1,6 +1,8 @@
 // The executor on small units made by hand: arithmetic at the widths' extremes, control, errors.
 #include "exec_unit.h"
 
+#include <cmath>
+
 namespace {
 TEST_F(ExecTest, IntegersWrapAtTheirWidth) {
     TYPE *i = pkg.int_t, *u = pkg.uint_t, *l = pkg.long_t, *ul = pkg.ulong_t, *ll = pkg.llong_t;
@@ -45,18 +47,6 @@ TEST_F(ExecTest, IntegersWrapAtTheirWidth) {
     EXPECT_EQ(printed, expected);
 }
 
-TEST_F(ExecTest, ComparisonsSayTheirSign) {
-    begin(main_sym);
-    body();
-    put(node(LT, pkg.int_t, num(-1, pkg.int_t), num(1, pkg.int_t)));
-    put(node(ULT, pkg.int_t, num(-1, pkg.int_t), num(1, pkg.int_t)));
-    put(node(ULT, pkg.int_t, num(65535, pkg.uint_t), num(65536, pkg.long_t)));
-    ret(0);
-    end();
-    EXPECT_EQ(run().status, 0);
-    EXPECT_EQ(printed, "1\n0\n1\n");
-}
-
 TEST_F(ExecTest, CountedLoopRunsOnceMoreThanItsCounter) {
     begin(main_sym);
     IC_SYMBOL *n = local("n", pkg.uint_t), *sum = local("sum", pkg.int_t);
@@ -71,38 +61,6 @@ TEST_F(ExecTest, CountedLoopRunsOnceMoreThanItsCounter) {
     end();
     EXPECT_EQ(run().status, 0);
     EXPECT_EQ(printed, "5\n");
-}
-
-TEST_F(ExecTest, ConditionalBranchJumpsWhenFalse) {
-    begin(main_sym);
-    body();
-    statement(node(CBRANCH, pkg.int_t, num(0, pkg.int_t), label(1)));
-    ret(1);
-    file->if_write_label(1);
-    ret(2);
-    end();
-    EXPECT_EQ(run().status, 2);
-}
-
-TEST_F(ExecTest, UnionTakesOneInitializer) {
-    TYPE* u = pkg.mk_union("two", 32, 32, false);
-    auto* whole = new fkMDATA("whole", pkg.long_t, 0, 0, 0, false, false, false, false);
-    whole->next = new fkMDATA("half", pkg.int_t, 0, 0, 0, false, false, false, false);
-    pkg.set_mdata(u, whole);
-    pkg.type_frozen(u);
-    TYPE* pair = pkg.mk_array(u, false, 2, true);
-    IC_SYMBOL* g = global("_g", pair);
-    begin(main_sym);
-    body();
-    IC_NODE* second =
-        node(PLUS, pkg.mk_ptr(pkg.long_t), node(PCONV, pkg.mk_ptr(pkg.long_t), node(UAND, pkg.mk_ptr(pair), name(g))),
-             num(2, pkg.long_t));
-    put(node(UMULT, pkg.long_t, second));
-    ret(0);
-    end();
-    initialize(g, {num(11, pkg.long_t), num(22, pkg.long_t)});
-    EXPECT_EQ(run().status, 0);
-    EXPECT_EQ(printed, "22\n");
 }
 
 TEST_F(ExecTest, DivisionByZeroIsReported) {
@@ -197,25 +155,33 @@ TEST_F(ExecTest, WhatHasNoTypeIsRefused) {
     expect_error(EXEC_UNSUPPORTED, "cannot execute EQ");
 }
 
-TEST_F(ExecTest, MultiplyAccumulateAddsTheProductOfTheLastTime) {
+// In the order of the codes: FEQ to FGT, the same where no order makes true as well, FORD, FUNO. Each is true for a set
+// of outcomes: 1 equal, 2 less, 4 greater, 8 unordered.
+TEST_F(ExecTest, FloatingComparisonsOfNumbersInfinitiesAndNoNumbers) {
+    TYPE* t = pkg.float_t;
+    const unsigned true_for[] = {1, 6, 3, 2, 5, 4, 9, 14, 11, 10, 13, 12, 7, 8};
+    const float inf = HUGE_VALF;
+    const float values[] = {1, 2, inf, NAN};
     begin(main_sym);
-    IC_SYMBOL *acc = local("acc", pkg.long_t), *product = local("product", pkg.long_t);
+    IC_SYMBOL *v[] = {local("one", t), local("two", t), local("inf", t), local("nan", t)}, *big = local("big", t);
     body();
-    statement(node(ASG, pkg.long_t, name(acc), num(100, pkg.long_t)));
-    statement(node(ASG, pkg.long_t, name(product), num(-8, pkg.long_t)));
-    TYPE* to_long = pkg.mk_ptr(pkg.long_t);
-    IC_NODE* args = num(-300, pkg.int_t);
-    for (IC_NODE* next : {num(200, pkg.int_t), node(ARGREF, to_long, name(acc)), node(ARGREF, to_long, name(product)),
-                          num(2, pkg.int_t)})
-        args = node(COMMA, pkg.int_t, args, next);
-    IC_NODE* mac = node(MCALL, pkg.void_t, args);
-    mac->text = "__parallel_mpy_sub";
-    statement(mac);
-    put(name(acc));
-    put(name(product));
+    statement(set(v[0], real("1", t)));
+    statement(set(v[1], real("2", t)));
+    statement(set(big, real("3e38", t)));
+    statement(set(v[2], node(MULT, t, name(big), name(big))));
+    statement(set(v[3], node(MINUS, t, name(v[2]), name(v[2]))));
+    std::string expected;
+    for (int i = 0; i < 4; i++)
+        for (int j = 0; j < 4; j++) {
+            const float a = values[i], b = values[j];
+            const unsigned outcome = a == b ? 1 : a < b ? 2 : a > b ? 4 : 8;
+            for (int k = 0; k < 14; k++) {
+                put(node(FEQ + k, pkg.int_t, name(v[i]), name(v[j])));
+                expected += outcome & true_for[k] ? "1\n" : "0\n";
+            }
+        }
     ret(0);
     end();
-    EXPECT_EQ(run().status, 0);
-    EXPECT_EQ(printed, "102\n-60000\n");
+    expect_output(expected);
 }
 } // namespace

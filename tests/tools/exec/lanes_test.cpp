@@ -50,24 +50,6 @@ TEST_F(LanesTest, ComplexArithmetic) {
     expect_output(expected);
 }
 
-// Operands of other part types are widened, a real number becomes a complex one.
-TEST_F(LanesTest, ComplexConversions) {
-    TYPE *narrow = pkg.mk_complex(pkg.float_t), *wide = pkg.mk_complex(pkg.ldouble_t);
-    begin(main_sym);
-    IC_SYMBOL *a = local("a", narrow), *b = local("b", wide);
-    body();
-    statement(set(a, pair(narrow, "0.5", "-2")));
-    statement(set(b, node(MULT, wide, name(a), node(SCONV, wide, name(a)))));
-    put_real(part(REAL, name(b)));
-    put_real(part(IMAG, name(b)));
-    statement(set(a, node(SCONV, narrow, num(-7, pkg.int_t))));
-    put_real(part(REAL, name(a)));
-    put_real(part(IMAG, name(a)));
-    ret(0);
-    end();
-    expect_output("-30\n-16\n-56\n0\n");
-}
-
 TEST_F(LanesTest, VectorArithmeticWrapsByLane) {
     TYPE *t = pkg.mk_vector(pkg.int_t, false, 4), *wide = pkg.mk_vector(pkg.long_t, false, 4);
     struct {

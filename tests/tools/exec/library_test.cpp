@@ -19,62 +19,6 @@ TEST_F(ExecTest, PrintfTakesEachArgumentInItsWidth) {
                   "text z% 2.12 5.000000e-01\n26\n");
 }
 
-TEST_F(ExecTest, TextAndMemoryAreOfUnits) {
-    TYPE *chars = pkg.mk_array(pkg.schar_t, false, 16, true), *to = pkg.mk_ptr(pkg.schar_t);
-    IC_SYMBOL* copy = library("_strcpy", {to, to}, to);
-    IC_SYMBOL* append = library("_strcat", {to, to}, to);
-    IC_SYMBOL* length = library("_strlen", {to}, pkg.ulong_t);
-    IC_SYMBOL* compare = library("_strcmp", {to, to}, pkg.int_t);
-    IC_SYMBOL* find = library("_strchr", {to, pkg.int_t}, to);
-    IC_SYMBOL* move = library("_memmove", {to, to, pkg.ulong_t}, to);
-    IC_SYMBOL* fill = library("_memset", {to, pkg.int_t, pkg.ulong_t}, to);
-    IC_SYMBOL* differ = library("_memcmp", {to, to, pkg.ulong_t}, pkg.int_t);
-    IC_SYMBOL* show = library("_puts", {to}, pkg.int_t);
-    begin(main_sym);
-    IC_SYMBOL* s = local("s", chars);
-    body();
-    auto at = [&](int k) {
-        return node(PLUS, to, node(PCONV, to, node(UAND, pkg.mk_ptr(chars), name(s))), num(k, pkg.long_t));
-    };
-    statement(call(copy, list({at(0), text("abc")})));
-    statement(call(append, list({at(0), text("defgh")})));
-    put(call(length, at(0)));
-    put(node(LT, pkg.int_t, call(compare, list({at(0), text("abd")})), num(0, pkg.int_t)));
-    put(node(MINUS, pkg.long_t, call(find, list({at(0), num('f', pkg.int_t)})), at(0)));
-    statement(call(move, list({at(2), at(0), num(6, pkg.ulong_t)})));
-    statement(call(show, at(0)));
-    statement(call(fill, list({at(1), num('x', pkg.int_t), num(3, pkg.ulong_t)})));
-    statement(call(show, at(0)));
-    put(call(differ, list({at(1), at(2), num(2, pkg.ulong_t)})));
-    ret(0);
-    end();
-    expect_output("8\n1\n5\nababcdef\naxxxcdef\n0\n");
-}
-
-TEST_F(ExecTest, HeapBlocksAreApartAndKeepTheirContents) {
-    TYPE* to = pkg.mk_ptr(pkg.int_t);
-    IC_SYMBOL* take = library("_malloc", {pkg.ulong_t}, to);
-    IC_SYMBOL* zeroed = library("_calloc", {pkg.ulong_t, pkg.ulong_t}, to);
-    IC_SYMBOL* grow = library("_realloc", {to, pkg.ulong_t}, to);
-    IC_SYMBOL* release = library("_free", {to}, pkg.void_t);
-    begin(main_sym);
-    IC_SYMBOL *p = local("p", to), *q = local("q", to);
-    body();
-    auto at = [&](IC_SYMBOL* s, int k) { return node(UMULT, pkg.int_t, node(PLUS, to, name(s), num(k, pkg.long_t))); };
-    statement(set(p, call(take, num(4, pkg.ulong_t))));
-    statement(node(ASG, pkg.int_t, at(p, 3), num(7, pkg.int_t)));
-    statement(set(q, call(zeroed, list({num(3, pkg.ulong_t), num(2, pkg.ulong_t)}))));
-    statement(node(ASG, pkg.int_t, at(q, 0), num(9, pkg.int_t)));
-    statement(set(p, call(grow, list({name(p), num(100, pkg.ulong_t)}))));
-    for (IC_NODE* n : {at(p, 3), at(q, 0), at(q, 5)}) put(n);
-    statement(call(release, name(p)));
-    // More than there is.
-    put(node(EQ, pkg.int_t, call(take, num(1000000, pkg.ulong_t)), num(0, to)));
-    ret(0);
-    end();
-    expect_output("7\n9\n0\n1\n");
-}
-
 TEST_F(ExecTest, ExitCallsWhatAtexitWasGiven) {
     TYPE* plain = function_type({}, pkg.void_t);
     IC_SYMBOL* at_exit = library("_atexit", {pkg.mk_ptr(plain)}, pkg.int_t);

@@ -23,12 +23,14 @@ bool is_character(const TYPE* t) { return t->is_schar() || t->is_uchar(); }
 
 bool is_narrow_integer(const TYPE* t) { return t->is_int() && t->size <= tp->int_t->size; }
 
-// What is compared once characters are dealt with.
+// What is compared once characters are dealt with. Floating types of one size, and an enumeration and its integer, have
+// one normalized form: one lvalue may tell the declared type of an object, and the other only that form.
 TYPE* compared_form(TYPE* t) {
     constexpr unsigned DROPPED = QUAL_CONST | QUAL_VOLATILE | QUAL_ONCHIP;
     constexpr unsigned DROPPED_IN_OLD_C = QUAL_VOLATILE | QUAL_ONCHIP;
     const bool old_c = old_const_pointer_behavior && currfuninfo && !TEST_FLAG(currfuninfo, FUN_is_cpp);
-    return essential_type(tp->remove_known_qual(t, old_c ? DROPPED_IN_OLD_C : DROPPED));
+    t = essential_type(tp->remove_known_qual(t, old_c ? DROPPED_IN_OLD_C : DROPPED));
+    return t->is_float() || t->is_enum() ? normalized_value_type(t) : t;
 }
 
 bool holds(TYPE* whole, TYPE* part) {

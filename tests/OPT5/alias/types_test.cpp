@@ -27,6 +27,7 @@ TEST_F(Types, Table) {
         {i, i, true, true, true},
         {i, l, true, true, false},
         {i, f, false, false, false},
+        {f, tp->double_t, false, false, tp->double_t->size == f->size}, // which normalized trees do not tell apart
         {i, tp->uint_t, true, true, true}, // signed and unsigned
         {i, tp->short_t, true, true, false},
         {const_of(i), i, true, true, true},

@@ -1,18 +1,18 @@
 // Division by constants: the reciprocals for every divisor of 16 bits, and the sequences as trees at every width.
 
-#include "../ir/evaluator.h"
 #include "../ir/function_fixture.h"
 
 #include "OPT5/scalar/divide.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/target.h"
+#include "tools/treecheck/evaluator.h"
 
+#include <algorithm>
 #include <random>
 
 namespace {
 
-using test_trees::EVALUATOR;
-using test_trees::I128;
+using I128 = __int128;
 using U128 = unsigned __int128;
 
 uint64_t scaled(const RECIPROCAL& r, uint64_t x) {
@@ -74,8 +74,29 @@ protected:
         return values;
     }
 
+    // The evaluator's memory: the dividend lies ahead, the values that a sequence saves behind it.
+    static constexpr uint32_t FIRST_PLACE = treecheck::FIRST_UNIT, PLACE_UNITS = 4;
+    static void place_saved_values(NODE* sequence, const SYMTAB* x) {
+        std::vector<SYMTAB*> saved;
+        for_each_node(sequence, [&](NODE* t) {
+            if (t->op != NAME || t->u.sym == x) return;
+            auto at = std::find(saved.begin(), saved.end(), t->u.sym);
+            if (at == saved.end()) at = saved.insert(at, t->u.sym);
+            t->u.sym->scratch_word = FIRST_PLACE + PLACE_UNITS * static_cast<uint32_t>(at - saved.begin() + 1);
+        });
+    }
+    static treecheck::BITS value(const NODE* tree, const SYMTAB* x, I128 dividend) {
+        treecheck::EVALUATOR machine;
+        for (unsigned n = 0; n < x->type->size / 16; ++n)
+            machine.memory[x->scratch_word + n] = static_cast<uint16_t>(dividend >> 16 * n);
+        const treecheck::BITS v = machine.eval(tree);
+        EXPECT_FALSE(machine.undefined) << tree_to_infix(tree);
+        return v;
+    }
+
     void expect_equal(int op, TYPE* type, INT65 divisor, bool must_go) {
         SYMTAB* x = local("x", type);
+        x->scratch_word = FIRST_PLACE;
         NODE* division = maketree(op, mk_NAME(x), mk_ICON(divisor, type), type);
         NODE* original = copy_tree(division);
         NODE* sequence = warp_DIV_to_MULT(division);
@@ -83,14 +104,12 @@ protected:
             EXPECT_FALSE(tree_contains_op(sequence, DIV) || tree_contains_op(sequence, MOD)) << tree_to_infix(original);
         }
         sequence = simp_tree(sequence, nullptr);
-        EVALUATOR machine;
+        place_saved_values(sequence, x);
         const I128 c = static_cast<I128>(divisor.value) - (divisor.is_negative() ? I128(1) << 64 : 0);
-        for (I128 value : dividends(type, c)) {
-            if (value == -(I128(1) << (type->size - 1)) && c == -1) continue; // overflows
-            machine.variables[x] = test_trees::integer(value, test_trees::shape(type));
-            const auto want = machine.eval(original), got = machine.eval(sequence);
-            ASSERT_EQ(got, want) << tree_to_infix(original) << " of " << static_cast<long long>(value) << " by "
-                                 << tree_to_infix(sequence);
+        for (I128 is : dividends(type, c)) {
+            if (is == -(I128(1) << (type->size - 1)) && c == -1) continue; // overflows
+            ASSERT_EQ(value(sequence, x, is), value(original, x, is))
+                << tree_to_infix(original) << " of " << static_cast<long long>(is) << " by " << tree_to_infix(sequence);
         }
         erase_tree(original);
         erase_tree(sequence);

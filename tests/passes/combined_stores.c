@@ -77,6 +77,16 @@ void seen_by_pointer(void) {
     g = *gp + 1;
 }
 
+// Of a double that is no wider than a float the one access tells the declared type, the other does not.
+// FUNCTION: seen_as_double
+// HAS: /reals.*= x/
+// HAS: /reals.*= \*\(a/
+static double reals[16];
+void seen_as_double(const double* a, int i, long l, float x) {
+    reals[l + 7] = x;
+    reals[l + 7] = a[i * 3 + 1] * 0.5;
+}
+
 // FUNCTION: through_a_pointer
 // COUNT 1: *_gp =
 // HAS: *_gp = 4
@@ -139,6 +149,8 @@ int main(void) {
     put_i16(real * 10);
     seen_by_pointer();
     put_i16(g);
+    seen_as_double(reals, 2, 0, 40);
+    put_i16(reals[7]);
     through_a_pointer();
     put_i16(g);
     n1.next = &n1;

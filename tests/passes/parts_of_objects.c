@@ -132,14 +132,6 @@ int read_between(struct outer* p, union word* w, int* q, int x) {
     return y;
 }
 
-// FUNCTION: read_as_double
-// COUNT 1: * 0x1.1p+4
-static double reals[4];
-void read_as_double(const double* a, int i, double x) {
-    reals[i] = x * 17;
-    reals[i] = a[3 * i - 2] * 0.5;
-}
-
 // FUNCTION: read_by_the_store
 // COUNT 3: * 17
 void read_by_the_store(struct pair* p, int* q, int i, int x) {
@@ -233,8 +225,6 @@ int main(void) {
     put_i32(stored_value(two, 10) + stored_value(two + 1, 1) + argument(two, 8));
     changed_between(two, &two[0].a, 11);
     put_i32(two[0].b);
-    read_as_double(reals, 1, 4.0);
-    put_i32((long)reals[1]);
     put_i32(restricted(&two[0].a, &two[1].a, 7));
     return 0;
 }

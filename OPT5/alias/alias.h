@@ -18,6 +18,9 @@ struct LOOP;
 struct LS;
 struct fkMDATA;
 
+// alias.cpp has the rules on pairs, type_rules.cpp the rule on types, address_taken.cpp the marks, pointers.cpp what
+// pointers are based on, alignment.cpp the alignments.
+
 // ---- Life
 // A pass asks for what it relies on with `need`: `fact::alias_marks` sets `is_aliased` of every symbol of the current
 // function and of the globals, true for an object that something other than its own NAME may reach; `fact::pointees` fills

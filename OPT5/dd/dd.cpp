@@ -1,5 +1,4 @@
-// What the step table and the writer call of this room. Each leaves the program as it is: the trees keep their
-// meaning, and what is not known is assumed not to hold.
+// Not built yet. What is called here leaves the program as it is, and what it is asked is not known.
 #include "OPT5/dd/dd.h"
 
 void build_loop_hierarchy(bool, bool, bool, bool) {}

@@ -1,7 +1,11 @@
 // The call graph of the file: its roots, its order, and which functions may call themselves.
 //
-// The record of the file stands for the outside world. It calls the roots; what calls outside, or through a pointer,
-// may come back through it.
+// Needs: every definition scanned (scan.cpp). Leaves: `cg_list`, and flags of functions that hold for all that they may
+// call.
+// Sound because the record of the file stands for the outside world: it calls the roots, and what calls outside, or
+// through a pointer, may come back through it. A guarantee of a function ("assigns no global", ...) is kept only if
+// everything keeps it that the function may call, to the end of every chain: one callee that is not known breaks them
+// all.
 
 #include "OPT5/ipa/progana.h"
 

@@ -1,4 +1,10 @@
 // Globals: who uses them how, and which of them never change.
+//
+// Needs: the call graph. Leaves: the uses of every global in its `cqual`, and `file_symbols_are_known`; initial values
+// of those that nothing writes.
+// Sound because every use is entered anew from the functions that are left, from clean-up code, from initializers and
+// from assembly text, and a symbol that others can name, that is volatile or that something sets ahead of `main` counts
+// as used in every form. A value that the linker or a pragma may replace is not taken (`initial_value_may_be_taken`).
 
 #include "OPT5/ipa/progana.h"
 

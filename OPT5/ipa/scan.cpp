@@ -1,8 +1,10 @@
 // One scan of a function's body: what it calls, reads and writes, and how large it is.
 //
-// The function starts with every guarantee ("assigns no global", ...), and the scan clears those that the body breaks.
-// A call breaks what the callee does not guarantee; a callee that has not been read yet guarantees what the reader
-// knows of it.
+// Needs: a definition that has been read. Leaves: the flags, callees and size of its record, and the uses of globals.
+// Sound because the function starts with every guarantee ("assigns no global", ...), and the scan clears those that the
+// body breaks. A call breaks what the callee does not guarantee; a callee that has not been read yet guarantees what
+// the reader knows of it, and the call graph takes back what its body breaks. Whatever the scan does not know, as
+// assembly text, breaks all.
 
 #include "OPT5/ipa/progana.h"
 

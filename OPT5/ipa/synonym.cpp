@@ -1,4 +1,10 @@
 // Functions that only pass their parameters on to another function of the same type.
+//
+// Needs: the statements of the function as a list, the last one first. Leaves: the statements as they are, and a pragma
+// that names the function called.
+// Sound because the body is a call with the function's own parameters in their order and a return of its result, so
+// that a caller cannot tell one from the other but by address: pragmas that say how a function is called or placed, and
+// groups of the linker that differ, keep the two apart.
 
 #include "OPT5/ipa/progana.h"
 

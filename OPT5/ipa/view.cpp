@@ -1,3 +1,5 @@
+// The call graph as a file for a viewer of graphs: only looks.
+
 #include "OPT5/ipa/view.h"
 
 #include "OPT5/ipa/progana.h"

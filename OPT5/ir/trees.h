@@ -1,6 +1,8 @@
 // The vocabulary that passes are written in: makers, queries, substitution, copying and erasing of trees.
 //
 // Makers return fresh trees with a null scope unless told. Functions that take a tree and return one consume the first.
+// Makers and calls are in tree_make.cpp, queries in tree_query.cpp, congruence in congruence.cpp, copying and erasing in
+// tree_copy.cpp, texts in tree_print.cpp.
 #pragma once
 
 #include "OPT5/ir/list.h"

@@ -1,6 +1,8 @@
 // The C type rules on trees: result types, casts, and the global facts about the target's scalar types.
 //
-// These keep the invariant that an operator's operands have the types that the operator requires.
+// These keep the invariant that an operator's operands have the types that the operator requires. Result types
+// are in type_ops.cpp, what casts a tree must have in type_ops_casts.cpp, conversion to a type in type_ops_coerce.cpp,
+// questions about types in type_ops_shape.cpp and about values in type_ops_value.cpp.
 #pragma once
 
 #include "OPT5/ir/node.h"

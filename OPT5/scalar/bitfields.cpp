@@ -4,14 +4,15 @@
 //   s.f = e      C = C & ~(m << k) | (e & m) << k
 //
 // with C an access of the container, k the field's place in it and m as many ones as it is wide. The container is the
-// 16-bit unit that the field lies in, whose other bits can belong to nothing but fields; a field that crosses units,
-// and a volatile one, is accessed as its declared type. A container that would reach past the structure or hold what is
-// no field is not touched: such an access stays as it is, and so does a field across units on a target whose numbers
-// start with the high unit. What is evaluated once stays so: an address or a value with side effects goes through a
-// variable ahead of the store.
-//
+// 16-bit unit that the field lies in. A field that crosses units, and a volatile one, is accessed as its declared type.
 // A local structure that is accessed by its fields alone becomes a variable for each of them. A small one that is
 // copied as a whole, too, and a union, becomes one integer variable, in which the fields lie as they did.
+//
+// Needs: nothing. Leaves: what rests on the graph; symbols are split anew where there are new ones.
+// Sound because the other bits of a unit can belong to nothing but fields. A container that would reach past the
+// structure or hold what is no field, which a store would write back too late, is not touched: such an access stays as
+// it is, and so does a field across units on a target whose numbers start with the high unit. What is evaluated once
+// stays so: an address or a value with side effects is kept in a variable ahead of the store.
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"

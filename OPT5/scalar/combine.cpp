@@ -1,8 +1,12 @@
 // Neighbouring assignments to one object in memory become one: a store less, and often a load.
 //
-// Two statements `x = e1` or `x op= e1`, then `x = e2` or `x op= e2`, with the same x. They have no side effects but
-// the stores, so that only reads of x between the two stores matter: those in e2 that name x are given the value of the
-// first, and any other that may read x keeps both statements. A local in a register gains nothing and is left alone.
+// Two statements `x = e1` or `x op= e1`, then `x = e2` or `x op= e2`, with the same x. A local in a register gains
+// nothing and is left alone.
+//
+// Needs: alias marks, pointees, pointer groups, where there are two such statements. Leaves: what rests on the graph.
+// Sound because the statements have no side effects but the stores, so that only reads of x between the two stores
+// matter: those in e2 that name x are given the value of the first, and any other that may read x, as `*p` in `x = 1; x
+// = *p` with `p == &x`, keeps both statements.
 #include "OPT5/scalar/fcp.h"
 
 #include "OPT5/alias/alias.h"

@@ -1,7 +1,11 @@
 // Shared tails: blocks that end the function in the same statements, and tests that stand twice.
 //
-// Only code is shared, nothing is evaluated more or less often or in another order, so side effects are no obstacle. A
-// block is compared with those of the same shape alone: the opcodes of its statements make a key.
+// A block is compared with those of the same shape alone: the opcodes of its statements make a key.
+//
+// Needs: nothing. Leaves: unreachable blocks and the numbers of before, for `rebuildcfg`.
+// Sound because only code is shared: the block that stays does what the removed one did, so nothing is evaluated more
+// or less often or in another order, and side effects are no obstacle. The entry block never takes a predecessor: its
+// parameters would be set anew.
 
 #include "OPT5/scalar/simpcfg.h"
 

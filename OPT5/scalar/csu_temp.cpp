@@ -1,14 +1,14 @@
-// Structure results go where they are wanted.
+// Structure results are built where they are wanted.
 //
-// A call's result that is stored to a temporary, and from there to a local, is stored to the local. That holds where nothing else
-// names the temporary, and neither the call nor anything outside of this function can see the local.
+// A call's result that is stored to a temporary, and from there to a local, is stored to the local. A function that
+// returns a structure through a hidden pointer, and fills a local that every path copies to where that points, fills
+// the place itself.
 //
-// A function that returns a structure through a hidden pointer, and fills a local that every path copies to where that
-// points, fills the place itself.
-//
-// The place is an object of the caller that nothing else names before the function returns: what the local is given, it
-// may be given at once. The pointer is used for nothing but those copies, so that no access through it stands between
-// them and the accesses of the local; and no copy is followed by anything that could still change the local.
+// Needs: alias marks. Leaves: what rests on the graph.
+// Sound because, of a call's result, nothing else names the temporary, and neither the call nor anything outside of
+// this function can see the local: a callee that reads the local while it writes its result would read the new value.
+// Of a hidden pointer, the place is an object of the caller that nothing else names before the function returns; the
+// pointer is used for nothing but the copies, and no copy is followed by anything that could still change the local.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"

@@ -1,11 +1,14 @@
 // Dead assignments: stores to a local that no path reads before the next store to it.
 //
-// One walk over each block against the order of evaluation, with the set of variables that are live at the point. What
-// a dead assignment computes stays for its effects. Variables that only die because an assignment went are found by the
-// next call: the sets of the other blocks are not recomputed, which leaves them too large and so safe.
+// One walk over each block against the order of evaluation, with the set of variables that are live at the point.
+// Variables that only die because an assignment was removed are found by the next call.
 //
 // A counter that nothing but its own steps reads would keep itself alive around its loop. So would any ring of
 // variables that only feed each other: they are found without regard to flow, and their reads don't count.
+//
+// Needs: live variables. Leaves: a simplified graph with block numbers; the sets of live variables are forgotten.
+// Sound because what a dead assignment computes stays for its effects, and the sets of other blocks, which are not
+// recomputed, are too large and so safe. A variable that is not a candidate is live everywhere.
 
 #include "OPT5/scalar/eda.h"
 

@@ -1,7 +1,9 @@
 // Stores of a destructor to the object that dies.
 //
-// Nobody may look at the object when its destructor is done, so a store to a member only serves statements of the
-// destructor itself and what they call. It is removed if none of those that can follow it may touch the member.
+// Needs: alias marks and pointees. Leaves: what rests on the graph.
+// Sound because nobody may look at the object when its destructor is done, so a store to a member only serves
+// statements of the destructor itself and what they call. It is removed if none of those that can follow it may touch
+// the member; a destructor of a base that is called behind it is one that may.
 
 #include "OPT5/scalar/eda.h"
 

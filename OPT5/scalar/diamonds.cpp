@@ -1,8 +1,11 @@
 // Small diamonds become selects.
 //
 // `if (c) x = a; else x = b;` and `return c ? a : b` in two blocks cost two jumps; as one statement the code generator
-// may use a conditional instruction, or the target's minimum and maximum. It may then compute both arms, so neither may
-// have a side effect or need the condition as its guard. The condition is evaluated first as before.
+// may use a conditional instruction, or the target's minimum and maximum.
+//
+// Needs: nothing. Leaves: unreachable blocks for `rebuildcfg`.
+// Sound because the condition is evaluated first as before, and the code generator, which may then compute both arms,
+// finds none that has a side effect or needs the condition as its guard: `if (p) x = *p;` stays.
 
 #include "OPT5/scalar/simpcfg.h"
 

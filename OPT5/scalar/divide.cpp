@@ -1,18 +1,21 @@
 // Divisions and moduli by constants become multiplications by a scaled reciprocal.
 //
-// For a divisor d and a scale k let m be 2^k / d rounded up to the next integer above, with the error e = m*d - 2^k >
-// 0. Then for x = q*d + r, x*m / 2^k = q + (r + x*e / 2^k) / d, and its integer part is q as long as x*e < 2^k. With m
-// rounded down, e = 2^k - m*d > 0, (x + 1)*m / 2^k = q + (r + 1 - (x + 1)*e / 2^k) / d has the integer part q as long
-// as (x + 1)*e <= 2^k. For a negative x rounded toward minus infinity the first form gives one less than the quotient,
-// which the sign of x puts right. (Granlund and Montgomery, Division by Invariant Integers using Multiplication, 1994;
-// Robison, N-bit Unsigned Division via N-bit Multiply-Add, 2005; Warren, Hacker's Delight, chapter 10.)
-//
-// One of the two roundings always finds a factor whose products fit in twice the width of x, and one product of that
-// width is what the target multiplies in one instruction. What is known of the bounds of x may allow a narrower
+// One of the two roundings below always finds a factor whose products fit in twice the width of x, and one product of
+// that width is what the target multiplies in one instruction. What is known of the bounds of x may allow a narrower
 // product. For dividends of the widest type without such bounds the upper half of the product is put together from four
-// products of halves. Signed division by a power of two is a shift of a biased dividend at every width.
+// products of halves. Signed division by a power of two is a shift of a biased dividend at every width. Runs late: the
+// passes before know more of a division than of what it becomes.
 //
-// Runs late: the passes before know more of a division than of what it becomes.
+// Needs: alias marks, where there is a division. Leaves: what rests on the graph; symbols are split anew, and there is
+// no assignment inside an expression.
+// Sound because, for a divisor d and a scale k, let m be 2^k / d rounded up to the next integer above, with the error e
+// = m*d - 2^k > 0. Then for x = q*d + r, x*m / 2^k = q + (r + x*e / 2^k) / d, and its integer part is q as long as x*e
+// < 2^k. With m rounded down, e = 2^k - m*d > 0, (x + 1)*m / 2^k = q + (r + 1 - (x + 1)*e / 2^k) / d has the integer
+// part q as long as (x + 1)*e <= 2^k. A dividend beyond those limits would get another quotient, so a factor is taken
+// only where the bounds of x keep to them. For a negative x rounded toward minus infinity the first form gives one less
+// than the quotient, which the sign of x puts right. (Granlund and Montgomery, Division by Invariant Integers using
+// Multiplication, 1994; Robison, N-bit Unsigned Division via N-bit Multiply-Add, 2005; Warren, Hacker's Delight,
+// chapter 10.)
 #include "OPT5/scalar/divide.h"
 
 #include "OPT5/alias/alias.h"

@@ -1,4 +1,8 @@
 // Live variables, dead assignments, and assignments that stand inside expressions.
+//
+//     live_variables.cpp    the analysis, and its fact          prop_asg.cpp      assignments into tests
+//     dead_assigns.cpp      removal of assignments              promote.cpp       assignments out of expressions
+//     destructor.cpp        stores of a destructor              statics.cpp       function-local statics
 #pragma once
 
 class BBLK;
@@ -27,7 +31,7 @@ int live_index(const SYMTAB* sym);
 // successor of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments were
 // removed. With `early` the graph is left to the caller to simplify.
 int elim_dead_assigns(bool keep_embedded, bool early);
-// In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads go.
+// In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads are removed.
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop);
 // Whether a variable is an induction variable of the loop that has no use but to count; null while no loops are known.
 extern bool (*is_loop_counter)(const SYMTAB* sym, const struct LOOP* loop);

@@ -1,10 +1,14 @@
 // A local structure whose members are all used by name becomes a set of variables, which can live in registers and are
 // seen by every pass that follows values.
 //
-// A structure can go if each mention of it in the function is the access of one scalar member in that member's own
+// Copies of a whole structure are taken member by member. A structure that only passes through whole stays, for one
+// copy is cheaper.
+//
+// Needs: alias marks and pointees. Leaves: what rests on the graph; symbols are split anew.
+// Sound because each mention of the structure in the function is the access of one scalar member in that member's own
 // type, or one side of a statement that copies a whole structure: there is no address of it then, no call gets it, and
-// no union or bit-field overlays its members. Copies are taken member by member; the other side must be a place that
-// stays where it is while that happens. A structure that only passes through whole stays, for one copy is cheaper.
+// no union or bit-field overlays its members. The other side of a copy must be a place that stays where it is while the
+// members are copied: `s = *s.next` would move with the first of them.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"

@@ -1,15 +1,17 @@
 // Fast constant and copy propagation: no data flow, one walk to count and one to rewrite.
 //
-// A local with one assignment in the whole function, to a value that is the same wherever it is evaluated, has that
-// value at every read that means anything: a read ahead of the assignment would see an undefined value. What must hold:
+// A local with one assignment in the whole function, to a value that is the same wherever it is evaluated, is replaced
+// by that value. All reads are replaced or none, so the assignment is removed with the last of them. A value that
+// itself names a variable that is about to be replaced waits for the next pass.
+//
+// Needs: alias marks. Leaves: a simplified graph with block numbers where a branch was decided, otherwise what rests on
+// the graph.
+// Sound because a read ahead of the only assignment would see an undefined value. What must hold:
 //   - nothing but its NAME reaches the variable, no exception's clean-up code names it, it is not volatile;
 //   - the value reads no variable that changes once it was read. Of the NAMEs only those qualify that are assigned
-//   once,
-//     at the function's entry. An immutable variable of an inner block does not: it has another value in each iteration of a
-//     loop, which a copy of it may outlive;
+//     once, at the function's entry. An immutable variable of an inner block does not: it has another value in each
+//     iteration of a loop, which a copy of it may outlive;
 //   - a string literal is one object, so that a pointer to one is moved, not copied.
-// All reads are replaced or none, so the assignment is removed with the last of them. A value that itself names a variable
-// that is about to be replaced waits for the next pass.
 #include "OPT5/scalar/fcp.h"
 
 #include "OPT5/alias/address_form.h"

@@ -1,4 +1,4 @@
-// Fast constant and copy propagation over a function, and the joining of neighbouring assignments.
+// Fast constant and copy propagation over a function, and the joining of neighbouring assignments (combine.cpp).
 #pragma once
 
 class NODE;

@@ -1,9 +1,13 @@
 // Tests that an earlier one decides.
 //
 // A condition q at the end of a block is decided on an edge behind an earlier IF on p if the side of p that leads there
-// implies q or its opposite, and nothing between the two tests changes what q reads; it is decided as well behind an
-// assignment of a constant to the one variable that q reads. Where every edge into the block is decided alike, the test
-// is removed; where a block is nothing but the test, a single edge into it is led past it.
+// implies q or its opposite; it is decided as well behind an assignment of a constant to the one variable that q reads.
+// Where every edge into the block is decided alike, the test is removed; where a block is nothing but the test, a
+// single edge into it is led past it.
+//
+// Needs: block numbers. Leaves: unreachable blocks for `rebuildcfg`.
+// Sound because nothing between the two tests may change what q reads: in `if (*p > 3) { f(); if (*p > 3) ...}` the
+// call may. No edge is led past the head of a loop: the loop would have a second entry.
 
 #include "OPT5/scalar/simpcfg.h"
 

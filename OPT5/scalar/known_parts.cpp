@@ -1,8 +1,11 @@
 // Parts of objects whose value a variable or a constant is known to hold: a later load takes that.
 //
 // `part = value` and `variable = part` make a fact; what may change the part, its address or the value ends it. Facts
-// go on into the next block where that is entered from this one alone. A load is replaced only where it is evaluated
-// before its statement changes anything.
+// go on into the next block where that is entered from this one alone.
+//
+// Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph.
+// Sound because a load is replaced only where it is evaluated before its statement changes anything: in `a = p->x +
+// f()` the call may store to `p->x`, and the load may come behind it.
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"

@@ -1,8 +1,10 @@
 // Signs of variables by their definitions.
 //
-// A signed variable that only its name reaches holds what its assignments give it. If each gives a value that is not
-// negative as long as the variables in it are not, no variable ever is: the first negative one would have come of
-// others. The sums and products of signed numbers are those of the numbers themselves (OPT5/simp/exact.h).
+// Needs: alias marks. Leaves: every fact: it only looks.
+// Sound because a signed variable that only its name reaches holds what its assignments give it. If each gives a value
+// that is not negative as long as the variables in it are not, no variable ever is: the first negative one would have
+// come of others. The sums and products of signed numbers are those of the numbers themselves (OPT5/simp/exact.h); with
+// sums that wrap, `i = i + 1` would prove nothing.
 #include "OPT5/scalar/known_signs.h"
 
 #include "OPT5/alias/alias.h"

@@ -1,4 +1,4 @@
-// Common subexpressions within a block, and assignments to parts of a variable.
+// Common subexpressions within a block (not built yet), and known values of parts of objects (known_parts.cpp).
 #pragma once
 
 void lcse();

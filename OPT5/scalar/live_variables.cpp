@@ -3,6 +3,10 @@
 // A candidate is a local scalar that is read and written by its NAME alone: its address is not taken, it is not
 // volatile, and no exception entry names it. The sets are the least solution of
 //   live_out(b) = union of live_in(s) over the successors s,   live_in(b) = use(b) | (live_out(b) - def(b)).
+//
+// Needs: alias marks. Leaves: every fact; symbols are split anew, and a statement that is a COMMAOP becomes two.
+// Sound because what is not a candidate counts as live everywhere: a variable that a pointer reaches could be read by
+// any load or call, and no set shows that.
 
 #include "OPT5/scalar/live_walk.h"
 

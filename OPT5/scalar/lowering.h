@@ -1,4 +1,7 @@
 // Passes that rewrite forms of the source into plainer ones, and back ahead of the output.
+//
+//     tail_recursion.cpp  bitfields.cpp  explode.cpp  divide.cpp  static_init.cpp  stack_sharing.cpp  csu_temp.cpp
+//     unsimplify.cpp      each what its name says; clusters and instrumentation, in lowering.cpp, are not built yet
 #pragma once
 
 class NODE;

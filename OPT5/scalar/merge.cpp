@@ -1,16 +1,17 @@
 // Induction variables of the loops, merged: as few as will do, and pointers where indexes scaled.
 //
 // An access whose address is an invariant plus constant multiples of inductions gets a pointer of its own, which starts
-// at the address's value ahead of the loop and is stepped right beside each step of an induction. So the pointer and
-// the address are equal between any two statements of the loop, however often and under whatever condition the
-// induction steps. Addresses that differ by a constant share a pointer; the others have an offset from it. Where the
-// steps would cost more than they save, the invariant part of the address alone is computed ahead of the loop.
+// at the address's value ahead of the loop. Addresses that differ by a constant share a pointer; the others have an
+// offset from it. Where the steps would cost more than they save, the invariant part of the address alone is computed
+// ahead of the loop. A counter that nothing needs but its own step and the test that leaves the loop gives its test to
+// a pointer.
 //
-// What is computed ahead of the loop is arithmetic on variables and addresses, which cannot fail; no load moves.
-//
-// A counter that nothing needs but its own step and the test that leaves the loop gives its test to a pointer. The test
-// becomes one for inequality, which holds in arithmetic that wraps: with a step of one, or a known trip count,
-// the pointer meets its last value exactly.
+// Needs: loops and live variables; no saved environment. Leaves: block numbers.
+// Sound because the pointer is stepped right beside each step of an induction: it equals the address between any two
+// statements of the loop, however often and under whatever condition the induction steps. An amount that changes in the
+// loop, as in `i += k++`, is no induction's. What is computed ahead of the loop is arithmetic on variables and
+// addresses, which cannot fail; no load moves. A test that a pointer takes over becomes one for inequality, which holds
+// in arithmetic that wraps: with a step of one, or a known trip count, the pointer meets its last value exactly.
 #include "OPT5/scalar/merge.h"
 
 #include "OPT5/ir/bblk.h"

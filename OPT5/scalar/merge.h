@@ -1,5 +1,5 @@
 // Names of variables: separate live ranges get symbols of their own, and the inductions of a loop are as few as will
-// do.
+// do. `rename_symbols` and `clone_symbol` are in rename.cpp, `eliminate_single_use_temps` in single_use.cpp, the rest in merge.cpp.
 #pragma once
 
 class SYMTAB;

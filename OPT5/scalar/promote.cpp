@@ -1,8 +1,13 @@
 // Assignments inside expressions become statements of their own.
 //
-// The walk follows the order of evaluation, left operand first. An assignment may move in front of its statement if
-// nothing that stays behind and is evaluated before it has a side effect or reads what it writes; the first side effect
-// that stays ends the search in that statement. Parts that run under a condition are not opened.
+// The walk follows the order of evaluation, left operand first. The first side effect that stays ends the search in its
+// statement.
+//
+// Needs: alias marks, pointees, pointer groups, where there is one. Leaves: what rests on the graph; symbols are split
+// anew.
+// Sound because an assignment moves in front of its statement only if nothing that stays behind and is evaluated before
+// it has a side effect or reads what it writes: in `a[i] = f() + (i = 1)` both keep it. Parts that run under a
+// condition are not opened, nor a statement that an exception may leave in its middle.
 
 #include "OPT5/scalar/eda.h"
 

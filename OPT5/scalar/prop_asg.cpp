@@ -1,4 +1,9 @@
-// What the assignment of registers asks of the data flow before it begins.
+// What the assignment of registers asks of the data flow before it begins: tests that hold the assignment in front of
+// them, and the number of loops around each block.
+//
+// Needs: live variables; loops, where an edge leads backward. Leaves: what rests on the graph.
+// Sound because the assignment moves into the one read of the variable that its block's test evaluates first, over
+// nothing that names the variable. A variable that is not a candidate might be reached by what else the test reads.
 
 #include "OPT5/scalar/eda.h"
 

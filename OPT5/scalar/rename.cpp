@@ -2,11 +2,15 @@
 //
 // A web is a set of assignments and reads that only makes sense together: two assignments are in one web if a read may
 // see the value of either. Webs are found as in the static single assignment form: where paths with different values of
-// a live variable meet, the values there become one web; the dominators' frontiers are these places. A variable takes
-// part if only its NAME reaches it. Only an assignment that is a statement starts a new value; one under a condition,
-// one in front of an exception's dispatch, a step or a part of the variable belongs to the web of the value before it.
+// a live variable meet, the values there become one web; the dominators' frontiers are these places. The web that the
+// function's entry gives a value keeps the symbol, so that a parameter stays what it is.
 //
-// The web that the function's entry gives a value keeps the symbol, so that a parameter stays what it is.
+// Needs: dominators and live variables; an entry without predecessors, and no saved environment. Leaves: what rests on
+// the graph.
+// Sound because a read is renamed with all assignments that it may see. A variable takes part if only its NAME reaches
+// it. Only an assignment that is a statement starts a new value; one under a condition, one in front of an exception's
+// dispatch, a step or a part of the variable belongs to the web of the value before it, since that value may still be
+// seen behind it.
 #include "OPT5/scalar/merge.h"
 
 #include "BITVEC/bitvec.h"

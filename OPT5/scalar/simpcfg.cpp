@@ -3,9 +3,14 @@
 // One pass visits the blocks from the last to the first, so that a branch is threaded over blocks whose own branches
 // are threaded already, and from the first to the last, so that a block takes over a whole chain of successors. A
 // change can make another one possible (a merged block holds a constant test, a dead block leaves its successor one
-// predecessor), so passes go on until nothing changes; each change removes a block, an edge or a control statement, and
-// there are few passes in practice. Control statements are cached by depth-first number, since a block's list must be
-// walked to find its last.
+// predecessor), so passes are repeated until nothing changes; each change removes a block, an edge or a control
+// statement, and there are few passes in practice. Control statements are cached by depth-first number, since a block's
+// list must be walked to find its last.
+//
+// Needs: no loop hierarchy, but ahead of the output. Leaves: a graph without unreachable blocks, with block numbers.
+// Sound because every path through the graph runs the same statements as before: only jumps, blocks without statements,
+// tests whose outcome is known and blocks that no path enters are removed. What a removed test computed stays for its
+// effects.
 
 #include "OPT5/scalar/simpcfg.h"
 

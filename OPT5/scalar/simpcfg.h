@@ -1,4 +1,10 @@
 // The control-flow simplifier, and the passes that shape the graph: cases, rotation, traces, superblocks, profile.
+//
+//     simpcfg.cpp         the simplifier, `split_block`       switch_cases.cpp    cases of switches
+//     implied_tests.cpp   tests that an earlier one decides   rotate.cpp          layout of loops
+//     entry_tests.cpp     first tests of loops                traces.cpp          layout by profile, annotations
+//     cross_jump.cpp      shared tails                        cond_paths.cpp      copies of tests on edges
+//     diamonds.cpp        selects                             superblocks.cpp     constants along chains of blocks
 #pragma once
 
 #include <cstdio>

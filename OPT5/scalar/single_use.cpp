@@ -1,8 +1,11 @@
 // Temporaries that are set once and read once, both in one block: the value is computed where it is read.
 //
-// What moves has no effects. Past other statements it moves only if it reads nothing but variables that their NAMEs
-// alone reach, none of which is assigned on the way; a value that is loaded moves into the next statement alone, and
-// only if that does nothing before it reads it. The read may stand under a condition: then less is computed.
+// Needs: the bits of the candidates of live variables. Leaves: the bits and the sets of all blocks: a temporary of one
+// block was in none; what rests on the graph.
+// Sound because what moves has no effects, and past other statements it moves only if it reads nothing but variables
+// that their NAMEs alone reach, none of which is assigned in between. A value that is loaded moves into the next
+// statement alone, and only if that does nothing before it reads it: in `t = *p; *q = 1; x = t` the store may meet the
+// load. The read may stand under a condition: then less is computed.
 #include "OPT5/scalar/merge.h"
 
 #include "OPT5/alias/effects.h"

@@ -1,14 +1,16 @@
 // Arrays and structures of disjoint lexical scopes share stack space: they become members of one union.
 //
-// An object lives from the entry of its block to its end, however control gets in and out, so that objects of two
-// blocks neither of which encloses the other never live at once. The tree of records follows the tree of scopes: a
-// record's variables stand side by side and ahead of what its children need, the children lie over each other. What
-// the outermost block declares lives as long as the function and stays out.
+// The tree of records follows the tree of scopes: a record's variables stand side by side and ahead of what its
+// children need, the children lie over each other. What the outermost block declares lives as long as the function and
+// stays out.
 //
-// Sound only while no access has left its scope: ahead of this step no pass moves a load or a store of memory
-// (`FUNINFO::stack_is_laid_out`), and a variable that is named outside of its scope all the same stays out. Behind this step the members are parts
-// of one object to every pass, at offsets that overlap, and the rule on types does not part accesses to what the union
-// holds (`lvalues_may_be_aliased`).
+// Needs: alias marks; no load or store of memory has moved (`FUNINFO::stack_is_laid_out`). Leaves: what rests on the
+// graph; symbols are split anew.
+// Sound because an object lives from the entry of its block to its end, however control gets in and out, so that
+// objects of two blocks neither of which encloses the other never live at once. That holds of accesses only while none
+// has left its scope, so a variable that is named outside of its scope all the same stays out. Behind this step the
+// members are parts of one object to every pass, at offsets that overlap, and the rule on types does not part accesses
+// to what the union holds (`lvalues_may_be_aliased`).
 #include "OPT5/scalar/stack_sharing.h"
 
 #include "OPT5/alias/alias.h"

@@ -1,10 +1,13 @@
 // What a static initializer stores ahead of everything else it does becomes the initial value of the objects.
 //
-// The function runs once, before the program proper, and a constant that it stores to an object without a value of its
-// own may as well be there from the start, as the language permits of what is initialized at run time. Taken are the
-// statements that run first, one after the other, up to the first call or branch. An object is left alone once a
-// statement that stays names it, or accesses memory through a pointer that may reach it: the store must not move ahead
-// of that. The initializer of a structure or an array gives zero to the parts that nothing was stored to.
+// Taken are the constants that are stored by the statements that run first, one after the other, up to the first call
+// or branch. The initializer of a structure or an array gives zero to the parts that nothing was stored to.
+//
+// Needs: alias marks; a function whose entry has no predecessors and that the program does not call. Leaves: what rests
+// on the graph.
+// Sound because the function runs once, before the program proper, and the language permits a value from the start for
+// what is initialized at run time. An object is left alone once a statement that stays names it, or accesses memory
+// through a pointer that may reach it: in `int b = a; int a = 3` the store to a must not move ahead of the read.
 #include "OPT5/alias/address_form.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"

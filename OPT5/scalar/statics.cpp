@@ -1,8 +1,9 @@
 // Function-local statics that every activation writes before it reads them become automatic variables.
 //
-// Such a static carries nothing from one call to the next, so that a variable of the frame does the same: unless
-// something else can see it, or the function is entered again while it is in use. A call may do that, so what was
-// written before a call counts as not written behind it. The analysis runs forward over the blocks with the set of
+// Needs: the statements of the function in blocks. Leaves: what rests on the graph; symbols are split anew.
+// Sound because such a static carries nothing from one call to the next, so that a variable of the frame does the same:
+// unless something else can see it, or the function is entered again while it is in use. A call may do that, so what
+// was written before a call counts as not written behind it. The analysis runs forward over the blocks with the set of
 // candidates that are written on every path; a read of one that is not in the set makes it stay.
 #include "OPT5/scalar/eda.h"
 

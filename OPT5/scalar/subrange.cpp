@@ -1,13 +1,16 @@
 // Stores that nothing reads: of a part that a later store covers first, and into objects of the frame that are not read
 // any more.
 //
-// Of two stores with the same address and nothing in between that may read what the second writes, the first is dead.
-// Within a block a walk from the last statement to the first keeps the stores that wait for such an earlier one; a
-// bounded number of them keeps long blocks linear. What an access may meet is left to the alias rules, and since they
-// judge by types too, the first store must be one that a read of the second's type could not miss.
+// Within a block a walk from the last statement to the first keeps the stores that wait for an earlier one to the same
+// address; a bounded number of them keeps long blocks linear. Structures and arrays of the frame that only their own
+// name can reach have a life like that of a variable, which spans blocks: a backward analysis with a bit for each. A
+// store to any part of one that is dead behind it is removed.
 //
-// Structures and arrays of the frame that only their own name can reach have a life like that of a variable, which
-// spans blocks: a backward analysis with a bit for each. A store to any part of one that is dead behind it is removed.
+// Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph.
+// Sound because nothing in between may read what the second store writes. What an access may meet is left to the alias
+// rules, and since they judge by types too, the first store must be one that a read of the second's type could not
+// miss: of `*f = 1.0; x = *f; *i = 2` at one address the read of a float is not held against the store of an integer,
+// and the first store must stay.
 
 #include "OPT5/scalar/subrange.h"
 

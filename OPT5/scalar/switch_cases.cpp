@@ -1,9 +1,12 @@
 // Switches whose control value is known to lie in a small range.
 //
-// Bounds, a common factor and bits that are always zero tell which values can occur. A case of another value is removed;
-// where all values that can occur have a case, the default is never taken and the code generator need not test the
-// bounds. The bounds come from the tree itself and from the assertions of the block that hold where the switch is
-// evaluated.
+// Bounds, a common factor and bits that are always zero tell which values can occur. A case of another value is
+// removed; where all values that can occur have a case, the default is never taken and the code generator need not test
+// the bounds.
+//
+// Needs: alias marks and pointees, where there is a switch; no loop hierarchy. Leaves: a graph with block numbers.
+// Sound because the bounds come from the tree itself and from those assertions of the block that hold where the switch
+// is evaluated: one on a variable that is assigned behind it says nothing there.
 
 #include "OPT5/scalar/simpcfg.h"
 

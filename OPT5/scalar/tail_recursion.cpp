@@ -1,11 +1,13 @@
 // A call that a function makes of itself as its last act becomes new values for its parameters and a jump to the start.
 //
-// The frame of the caller is gone then while the callee runs, so no address of anything in it may be known to anyone,
-// and nothing may depend on which frame it is: no handler, no saved environment, no part of the argument list beyond
-// the named parameters. `restrict` speaks of one activation; a pointer that bears it keeps its value.
-//
 // A call is the last act too where it is an arm of the conditional value that is returned, and, of a function that
 // returns truth values alone, where the rest of `a && b` or `a || b` is the call: such a return is taken apart first.
+//
+// Needs: alias marks and pointees, where there is such a call. Leaves: nothing where it found one.
+// Sound because the frame of the caller is no longer in use while the callee runs: no address of anything in it may be
+// known to anyone, as in `return f(&x)`, and nothing may depend on which frame it is: no handler, no saved environment,
+// no part of the argument list beyond the named parameters. `restrict` speaks of one activation; a pointer that bears
+// it keeps its value.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"

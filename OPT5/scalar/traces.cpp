@@ -3,6 +3,10 @@
 // Seeds are blocks by descending frequency. A trace grows from its seed along the likeliest edge, forward and then
 // backward, over blocks that no trace has yet. The traces stand in the order of their seeds, but the one that holds the
 // entry comes first.
+//
+// Needs: block numbers, frequencies of a profile. Leaves: block numbers, which are layout positions.
+// Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does
+// not fall into its successor.
 
 #include "OPT5/scalar/sblk.h"
 #include "OPT5/scalar/simpcfg.h"

@@ -3,7 +3,9 @@
 //   pointer + index * n    the product is PMCONV, which is what scaled addressing is found by
 //   x + -c                 x - c, whose immediate is the shorter one
 //
-// Every value stays the same, and reading the output brings the simplifier's forms back.
+// Needs: nothing; no row behind it simplifies. Leaves: every fact.
+// Sound because every value stays the same, in the type that it had: a size that the type of the index cannot hold must
+// not be written in that type. Reading the output brings the simplifier's forms back.
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"

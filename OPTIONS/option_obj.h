@@ -170,8 +170,6 @@ public:
     void setarg(int id, const char* value);
     void clearopt(int id);
     void clear_conflicting(int id); // every option that conflicts with `id` in any degree, in silence
-    void setclass(class_id c) { setclassmembers(c); }
-    void clearclass(class_id c) { clearclassmembers(c); }
     void setclassmembers(class_id c); // options without argument
     void clearclassmembers(class_id c);
     void parsed_option(int id, int form = 0); // marks that the parser saw it
@@ -187,7 +185,6 @@ public:
     bool testclass(class_id c) const; // any member present
     bool seenclass(class_id c) const; // any member seen by the parser
     static std::vector<int> class_list_for_option(int id);
-    int clear_count_of(int id) const { return clear_count[id]; }
     const std::list<event>& events() const { return history; }
 
     // ---- Export
@@ -226,7 +223,6 @@ private:
     [[noreturn]] void report_and_exit(DIAGNOSTIC&& message) const;
     static bool valid(int id) { return id >= 0 && id < OPTION_COUNT; }
     const char* parse_one(const char* word);
-    const char* take_option(const char* word, int id, int form);
     void store(int id, const argument& arg);
     void first_argument(int id);
     void do_conflicts(int id);

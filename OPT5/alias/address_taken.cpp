@@ -114,8 +114,6 @@ bool is_vector_or_complex(const TYPE* type) { return type->is_vector() || type->
 
 } // namespace
 
-void mark_addressed_symbols(NODE* tree) { mark_addressed(tree, false); }
-
 bool marks_are_known() { return is_known(fact::alias_marks); }
 
 bool may_be_reached_by_pointers(const SYMTAB* sym) {

@@ -30,9 +30,6 @@ void init_aliasing_info(bool groups);
 // Marks the vector and complex variables that are accessed by parts or as another type. `clear_bitnum` also takes them
 // out of the candidates that are numbered by `bitnum`; `aliased` is the mark that they get.
 void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased);
-// Marks what `tree` takes the address of. A scalar is marked by any UAND or ARGREF; an array by one that is not merely
-// the address of an access.
-void mark_addressed_symbols(NODE* tree);
 void reset_alias_info(); // what is known of the current function's references is dropped
 void clean_up_alias_analysis_bitvecs_etc();
 void init_dd_aliasing();

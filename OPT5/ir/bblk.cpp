@@ -94,13 +94,7 @@ void recount(const std::vector<NODE*>& branches) {
         });
 }
 
-} // namespace
-
-void recount_label_references() { recount(collect_branches()); }
-
 // ---- Blocks
-
-namespace {
 
 void find_positions(BBLK* bb) {
     bb->first_psn = bb->last_psn = nullptr;

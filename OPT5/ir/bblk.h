@@ -67,8 +67,6 @@ public:
 // ---- Building and numbering
 void buildcfg();
 void rebuildcfg();
-// Counts the LABELREFs of every label anew; `renumber_bblocks` does so itself.
-void recount_label_references();
 // Visits every LABELREF of a control statement, in written order; other statements name no labels.
 template <class F> void for_each_branch_target(NODE* tree, F&& visit);
 void renumber_bblocks();

@@ -5,7 +5,6 @@
 
 SYMLIST* mk_symlist(SYMTAB* sym, SYMLIST* next) { return new SYMLIST{sym, next}; }
 SYMALIST* mk_symalist(SYMTAB* sym, NODE* tree, SYMALIST* next) { return new SYMALIST{sym, tree, next}; }
-SYMPAIRLIST* mk_sympairlist(SYMTAB* a, SYMTAB* b, SYMPAIRLIST* next) { return new SYMPAIRLIST{a, b, next}; }
 
 bool symbol_in_list(const SYMTAB* sym, const SYMTAB* list) {
     for (; list; list = list->next)

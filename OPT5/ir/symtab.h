@@ -188,7 +188,6 @@ void interned_stats();
 
 SYMLIST* mk_symlist(SYMTAB* sym, SYMLIST* next);
 SYMALIST* mk_symalist(SYMTAB* sym, NODE* tree, SYMALIST* next);
-SYMPAIRLIST* mk_sympairlist(SYMTAB* a, SYMTAB* b, SYMPAIRLIST* next);
 bool symbol_in_list(const SYMTAB* sym, const SYMTAB* list); // a list through `next`
 SYMLIST* find_sym_in_symlist(const SYMTAB* sym, SYMLIST* list);
 SYMLIST* remove_sym_from_symlist(const SYMTAB* sym, SYMLIST* list);

@@ -6,15 +6,17 @@
 //
 // Needs: block numbers, frequencies of a profile. Leaves: block numbers, which are layout positions.
 // Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does
-// not fall into its successor.
+// not fall into its successor. Only what a pragma promises of the loop behind it in the text would come to speak of
+// another loop, so the block behind one stays there.
 
 #include "OPT5/scalar/sblk.h"
 #include "OPT5/scalar/simpcfg.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
-#include "OPT5/ir/trees.h"
 #include "OPT5/ir/profile.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/trees.h"
 
 #include <algorithm>
 #include <cmath>
@@ -87,16 +89,22 @@ BBLK* likeliest(EDGE* edges, bool forward) {
     return best ? best->first : nullptr;
 }
 
+// Whether `second` may be laid out behind `first`: the block behind a promise of iterations stays behind that one.
+bool may_be_neighbours(const BBLK* first, const BBLK* second) {
+    if (first->dflink == second) return true;
+    return !ends_in_promise(first) && !ends_in_promise(second->rdflink);
+}
+
 void grow(SBLK* trace) {
     while (BBLK* next = likeliest(trace->tail->successors, true)) {
-        if (next->trace || next == currfuninfo->bb_list) break;
+        if (next->trace || next == currfuninfo->bb_list || !may_be_neighbours(trace->tail, next)) break;
         trace->add_basic_block(next);
     }
     while (trace->head != currfuninfo->bb_list) {
         BBLK* before = likeliest(trace->head->predecessors, false);
         if (!before || before->trace) break;
         // A block whose likeliest successor is another one belongs to that one's trace.
-        if (likeliest(before->successors, true) != trace->head) break;
+        if (likeliest(before->successors, true) != trace->head || !may_be_neighbours(before, trace->head)) break;
         trace->add_basic_block_in_front(before);
     }
 }
@@ -140,18 +148,37 @@ void validate_traces(const TRACES& traces) {
     }
 }
 
+// The blocks in their new order: by traces, but a trace that ends in a promise is followed by the one that begins with
+// the loop. Blocks that promises lead in a circle are left out.
+std::vector<BBLK*> order_of(const TRACES& traces) {
+    const BBLK* const entry = currfuninfo->bb_list;
+    std::vector<BBLK*> order;
+    for (const auto& trace : traces) {
+        if (trace->head != entry && ends_in_promise(trace->head->rdflink)) continue; // comes behind that one
+        for (const SBLK* t = trace.get(); t;) {
+            order.insert(order.end(), t->contents.begin(), t->contents.end());
+            const BBLK* tail = t->tail;
+            t = tail->dflink && ends_in_promise(tail) ? static_cast<const SBLK*>(tail->dflink->trace) : nullptr;
+        }
+    }
+    return order;
+}
+
 void lay_out(TRACES& traces) {
     BBLK* const entry = currfuninfo->bb_list;
     const auto first = std::find_if(traces.begin(), traces.end(), [entry](const auto& t) { return t->head == entry; });
     if (first == traces.end()) return;
     std::rotate(traces.begin(), first, first + 1);
+    size_t count = 0;
+    for (const auto& trace : traces) count += trace->contents.size();
+    const std::vector<BBLK*> order = order_of(traces);
+    if (order.size() != count) return;
     BBLK* last = nullptr;
-    for (const auto& trace : traces)
-        for (BBLK* bb : trace->contents) {
-            if (last) last->dflink = bb;
-            bb->rdflink = last;
-            last = bb;
-        }
+    for (BBLK* bb : order) {
+        if (last) last->dflink = bb;
+        bb->rdflink = last;
+        last = bb;
+    }
     last->dflink = nullptr;
     entry->rdflink = last;
 }

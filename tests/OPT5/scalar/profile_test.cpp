@@ -16,7 +16,7 @@ protected:
         b->set_edge_profile(m);
         add(mk_IF(mk_NAME(cond), a, b));
     }
-    // if (x) x = 1 (10 times) else x = 2 (90 times); a loop of 10 rounds an entry behind it.
+    // if (x) x = 1 (10 times) else x = 2 (90 times); a loop of 10 iterations an entry behind it.
     void diamond_and_loop() {
         x = local("x");
         branch_counted(x, 1, 10, 2, 90);
@@ -67,18 +67,39 @@ TEST_F(ProfileTest, WithoutDataNothingIsAnnotatedAndTheLayoutStays) {
     EXPECT_EQ(layout(), before);
 }
 
-TEST_F(ProfileTest, TheLikelyWayIsLaidOutStraight) {
+TEST_F(ProfileTest, TheLikelyPathIsLaidOutStraight) {
     diamond_and_loop();
     straighten_traces_in_cfg();
     const std::vector<BBLK*> order = layout();
     EXPECT_EQ(order.front(), currfuninfo->bb_list);
     EXPECT_EQ(currfuninfo->bb_list->dflink, block_of(2));
     EXPECT_EQ(block_of(2)->dflink, block_of(3));
-    EXPECT_EQ(order.back(), block_of(1)) << "the unlikely way stands aside";
+    EXPECT_EQ(order.back(), block_of(1)) << "the unlikely path stands aside";
     EXPECT_TRUE(valid());
 }
 
-TEST_F(ProfileTest, ALoopIsToldHowOftenItGoesRound) {
+TEST_F(ProfileTest, WhatIsSaidOfALoopStaysInFrontOfIt) {
+    x = local("x");
+    assign(x, 1);
+    define(1);
+    branch_counted(x, 1, 900, 2, 100);
+    define(2);
+    assign(x, 2);
+    define(3);
+    branch_counted(x, 3, 9900, 4, 100); // the more frequent loop, which is laid out first
+    define(4);
+    ret(x);
+    currfuninfo->profile_status = 2;
+    currfuninfo->entry_count = 100;
+    build();
+    add_loop_annotation_from_profile();
+    straighten_traces_in_cfg();
+    EXPECT_EQ(currfuninfo->bb_list->dflink, block_of(1)) << "10 iterations";
+    EXPECT_EQ(block_of(2)->dflink, block_of(3)) << "100 iterations";
+    EXPECT_TRUE(valid());
+}
+
+TEST_F(ProfileTest, ALoopIsToldItsTripCount) {
     diamond_and_loop();
     add_loop_annotation_from_profile();
     const NODE* mark = nullptr;

@@ -200,4 +200,44 @@ TEST(DiagEnds, ErrorLimitFatalAndDie) {
                 "internal fatal error #99926: \\(here: gone\\)");
 }
 
+TEST_F(Diag, AdviceComparesItsText) {
+    const DIAG_SRCINFO_DATA at("x.c", 7, 3), elsewhere("x.c", 8, 3);
+    DIAG::gadvice a("f", 1, "same"), b("f", 2, "same"), c("f", 1, "other"), d("f", 1, "same"), e("f", 1, "same");
+    d.set_src(&at);
+    e.set_src(&elsewhere);
+    EXPECT_TRUE(a.is_equal(&b));
+    EXPECT_FALSE(a.is_equal(&c));
+    EXPECT_FALSE(a.is_equal(&d));
+    EXPECT_FALSE(d.is_equal(&e));
+    DIAGNOSTIC* const copy = d.alloc();
+    EXPECT_TRUE(copy->is_equal(&d));
+    EXPECT_STREQ(copy->get_sp_buffer(), "same");
+    delete copy;
+    c.free_mem();
+    EXPECT_TRUE(a.is_equal(&c)) << "one without text equals any";
+}
+
+TEST_F(Diag, BufferFormWrapsAt79WithIndent10) {
+    const std::string word(30, 'w');
+    char* const text = DIAGNOSTIC::sp_print("%s %s %s", word.c_str(), word.c_str(), word.c_str());
+    EXPECT_EQ(std::string(text), word + " " + word + "\n          " + word);
+    std::free(text);
+}
+
+TEST_F(Diag, LineThatIsFullStartsANewOne) {
+    DIAGNOSTIC::diag_cols_m = 20;
+    class two_parts : public DIAG::text_message {
+    public:
+        two_parts() : text_message(24003, "f", 1, "") {}
+        void report() override {
+            print_header();
+            print("%s", "12345678901"); // "warning: " and these fill the line
+            print("%s", "x");
+            flush();
+        }
+    };
+    two_parts().report();
+    EXPECT_EQ(take(), "warning: 12345678901\n   x\n");
+}
+
 } // namespace

@@ -156,3 +156,21 @@ TEST(FpsimText, CanonicalLiterals) {
         free(text);
     }
 }
+
+TEST(FpsimText, DigitStrings) {
+    int point, sign;
+    simul_fval x = sim(-1234.5);
+    EXPECT_STREQ(f_ecvt(&x, 6, &point, &sign), "123450");
+    EXPECT_EQ(point, 4);
+    EXPECT_EQ(sign, 1);
+    EXPECT_STREQ(f_fcvt(&x, 2, &point, &sign), "123450");
+    x = sim(9.996);
+    EXPECT_STREQ(f_fcvt(&x, 2, &point, &sign), "1000");
+    EXPECT_EQ(point, 2);
+    x = sim(1.5);
+    EXPECT_STREQ(f_acvt(&x, -1, &point, &sign), "18");
+    char text[70];
+    EXPECT_STREQ(f_utoa(255, text, 16), "ff");
+    EXPECT_EQ(f_f2ascii(text, 8, 2, 'f', &x), 8);
+    EXPECT_STREQ(text, "    1.50");
+}

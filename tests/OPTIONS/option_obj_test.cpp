@@ -314,4 +314,52 @@ TEST(OptionHelp, ShowsEveryOptionOnce) {
     EXPECT_EXIT(O().process_option("a?", nullptr), testing::ExitedWithCode(0), "");
 }
 
+TEST(OptionState, ClearHistoryAndPersistence) {
+    O o;
+    EXPECT_TRUE(parse(o, {"-i5", "-x1", "-x2", "-v28", "-a"}));
+    EXPECT_EQ(o.events().size(), 5u);
+    o.clearopt(O::OO_aux_cmd_flag);
+    EXPECT_EQ(o.events().size(), 3u);
+    EXPECT_EQ(o.getargcount(O::OO_aux_cmd_flag), 0u);
+    testing::internal::CaptureStderr();
+    o.clearopt(O::OO_silicon_version);
+    EXPECT_NE(testing::internal::GetCapturedStderr().find("clear PERSISTENT option -v ignored"), std::string::npos);
+    EXPECT_STREQ(o.getstrarg(O::OO_silicon_version), "28");
+    EXPECT_TRUE(o.export_option_list(1).empty()) << "nothing was cleared and set again";
+    EXPECT_TRUE(parse(o, {"-x3"}));
+    EXPECT_EQ(o.export_option_list(1), std::vector<std::string>{"--aux_cmd_flag=3"});
+    o.setopt(99);
+    o.setopt(-1);
+    EXPECT_FALSE(o.getopt(99));
+    const O copy = o;
+    o.clearclassmembers(O::CLASS_ALL);
+    EXPECT_EQ(state(copy), "--aliased_variables --auto_inline=5 --aux_cmd_flag=3 --silicon_version=28");
+}
+
+TEST(OptionState, NumbersAsTextAndWrongKinds) {
+    O o;
+    o.setarg(O::OO_silicon_version, 27L);
+    o.setarg(O::OO_aux_cmd_flag, 4L);
+    EXPECT_STREQ(o.getstrarg(O::OO_silicon_version), "27");
+    EXPECT_STREQ(o.getstrarg(O::OO_aux_cmd_flag), "4");
+    EXPECT_EXIT(o.setarg(O::OO_single_inline, 4L), testing::ExitedWithCode(1), "unhandled clause in setarg");
+    EXPECT_EXIT(o.setarg(O::OO_auto_inline, "4"), testing::ExitedWithCode(1), "unhandled clause in setarg");
+    o.setarg(O::OO_opt_level, 999L);
+    std::string text;
+    EXPECT_TRUE(o.export_option(O::OO_opt_level, 0, &text));
+    EXPECT_EQ(text, "--opt_level=error");
+}
+
+TEST(Rot13, TurnsAndReusesItsBuffers) {
+    EXPECT_STREQ(O::rot13("-Opt_level=2%"), "%Bcg_yriry=2-");
+    EXPECT_STREQ(O::rot13(O::rot13("--Zz:")), "--Zz:");
+    EXPECT_STREQ(O::rot13(nullptr), "");
+    const char* const first = O::rot13("a");
+    for (const char* text : {"b", "c", "d", "e"}) O::rot13(text);
+    EXPECT_STREQ(first, "n") << "five results live";
+    O::rot13("f");
+    EXPECT_STREQ(first, "s") << "the sixth takes the place of the first";
+    EXPECT_EQ(std::strlen(O::rot13(std::string(500, 'a').c_str())), 500u);
+}
+
 } // namespace

@@ -224,4 +224,47 @@ TEST_F(Target, WhatCommonSubexpressionsMayTake) {
     EXPECT_FALSE(is_barrier_MCALL("strlen"));
 }
 
+TEST_F(Target, AssociativePairs) {
+    BIF* other = instantiate_associative_BIF("__mpy_a", find_BIF_descriptor("__mpy"));
+    EXPECT_TRUE(other->has(IS_SELF_ASSOCIATIVE));
+    EXPECT_TRUE(other->has(TOWERS_LIKE_PLUS));
+    EXPECT_EQ(find_BIF_descriptor("__mpy")->associative_partner, other);
+    EXPECT_EXIT(instantiate_associative_BIF("__mpy_b", other), testing::ExitedWithCode(1), "");
+}
+
+TEST_F(Target, StrictTernaries) {
+    NODE* t = bin(QUEST, name(symbol("c", tp->int_t)), bin(COLON, icon(1), icon(2)), tp->int_t);
+    t = make_strict_ternary_ICALL(t);
+    EXPECT_TRUE(is_strict_ternary_ICALL(t));
+    EXPECT_EQ(show(t), "quest$colon(c, 1, 2)");
+    EXPECT_EQ(show(undo_strict_ternary_ICALL(t, false)), "c ? 1 : 2");
+}
+
+TEST_F(Target, InOutArguments) {
+    SYMTAB *x = symbol("x", tp->long_t), *found = nullptr;
+    NODE* direct = maketree(ARGREF, name(x), nullptr, tp->mk_ptr(tp->long_t));
+    NODE* through = maketree(ARGREF, deref(address(name(x))), nullptr, tp->mk_ptr(tp->long_t));
+    for (NODE* t : {direct, through}) {
+        found = nullptr;
+        EXPECT_TRUE(tree_is_IN_OUT_argument(t, &found));
+        EXPECT_EQ(found, x);
+    }
+    EXPECT_FALSE(tree_is_IN_OUT_argument(name(x), &found));
+}
+
+TEST_F(Target, MisuseOfDescriptorsIsInternal) {
+    auto dies = testing::ExitedWithCode(1);
+    EXPECT_EXIT(make_BIF_descriptor(ICALL, "__rol", 1, tp->long_t), dies,
+                "INTERNAL ERROR in make_BIF_descriptor\\(\\) for \"__rol\"");
+    EXPECT_EXIT(make_BIF_descriptor(PLUS, "__new", 1, tp->long_t), dies, "make_BIF_descriptor");
+    EXPECT_EXIT(instantiate_generic_BIF("__x", find_BIF_descriptor("__rol")), dies,
+                "INTERNAL ERROR in instantiate_generic_BIF");
+    EXPECT_EXIT(get_BIF_parameter('z', find_BIF_descriptor("__rol")), dies, "");
+    BIF* bif = make_BIF_descriptor(ICALL, "__new", 2, tp->long_t);
+    EXPECT_EXIT(def_BIF_parameter(bif, 1, tp->int_t, 'b'), dies, "INTERNAL ERROR in def_BIF_parameter");
+    add_BIF_semantics(bif, icon(1), true);
+    EXPECT_TRUE(bif->has(MUST_EXPAND));
+    EXPECT_EXIT(add_BIF_semantics(bif, icon(1), false), dies, "INTERNAL ERROR in add_BIF_semantics");
+}
+
 } // namespace

@@ -4,8 +4,8 @@
 //     the steps          steps.cpp      0 to 80, the numbered table
 //     ahead of output    writing.cpp    what the last step, "output function", does before it writes
 //
-// Nothing else calls a pass. A row says what the pass needs and what it leaves true (OPT5/ir/facts.h); whatever it does
-// not name is forgotten behind it.
+// Nothing else runs a pass. A row says what the pass needs and what it leaves true (OPT5/ir/facts.h); whatever it does
+// not name is forgotten behind it. A pass that has work in few functions asks for facts by itself, behind its first look.
 #pragma once
 
 #include "OPT5/ir/facts.h"
@@ -57,6 +57,8 @@ void check_row_switches();
 struct ROWS {
     const ROW* first;
     int count;
+    template <int N>
+    ROWS(const ROW (&rows)[N]) : first(rows), count(N) {}
     const ROW* begin() const { return first; }
     const ROW* end() const { return first + count; }
 };
@@ -65,5 +67,6 @@ ROWS rows_of_steps();
 ROWS rows_ahead_of_output();
 
 // ---- Conditions of rows
+constexpr bool (*always)() = nullptr;
 bool L1(); // the level of the current function is at least 1
 bool L2();

@@ -32,7 +32,6 @@ void size_site_sets() {
 }
 
 constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED, IDLE = ROW::IDLE;
-constexpr bool (*always)() = nullptr;
 using fact::alias_marks;
 using fact::graph;
 using fact::none;
@@ -75,7 +74,7 @@ class PASS_LISTENER final : public READ_LISTENER {
 
 } // namespace
 
-ROWS rows_behind_reading() { return {rows, sizeof rows / sizeof rows[0]}; }
+ROWS rows_behind_reading() { return rows; }
 
 READ_LISTENER& pass_listener() {
     static PASS_LISTENER listener;

@@ -47,7 +47,6 @@ bool L2_with_branches_on_28() { return L2_with_branches() && cpu_version == 28; 
 bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
 bool is_stack_shared() { return L1() || (float_support | 1) != 11; }
 bool fusion_is_enabled() { return L2() && pass_enable_loop_fusion; }
-constexpr bool (*always)() = nullptr;
 
 // ---- Actions that are more than a line
 
@@ -255,7 +254,7 @@ const ROW steps[] = {
     /* 23 */ {L, "SSA RP with benign loads", nullptr, L2, [] { promote_vars_to_registers(true); }, none, none},
     /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
     /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
-    /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias},
+    /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
     /* 28 */ {L, "forward_substitution", &DF, L2, nothing, none, none},
     /* 29 */ {L, "SSA_hoist", &D, L2, [] { in_SSA_form<true>(hoist_SSA_region_constants); }, none, none},
@@ -325,7 +324,7 @@ void add(int first, int behind, std::vector<pass*>& order) {
 
 } // namespace
 
-ROWS rows_of_steps() { return {steps, COUNT}; }
+ROWS rows_of_steps() { return steps; }
 
 void add_dd_normal_order_passes(std::vector<pass*>& order) { add(FIRST_DD, BEHIND_DD, order); }
 

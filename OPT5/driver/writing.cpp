@@ -25,7 +25,6 @@ namespace {
 bool is_written() { return !TEST_FLAG(currfuninfo, FUN_is_suppressed); }
 
 constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED, IDLE = ROW::IDLE;
-constexpr bool (*always)() = nullptr;
 using fact::graph;
 using fact::live_variables;
 using fact::none;
@@ -60,7 +59,7 @@ const ROW rows[] = {
 
 } // namespace
 
-ROWS rows_ahead_of_output() { return {rows, sizeof rows / sizeof rows[0]}; }
+ROWS rows_ahead_of_output() { return rows; }
 
 void output_function() {
     run_rows_ahead_of_output();

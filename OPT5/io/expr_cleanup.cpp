@@ -11,6 +11,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
 #include "UTIL/safemem.h"
@@ -23,10 +24,9 @@ namespace {
 constexpr int ADDRESS_UNIT = 16;
 
 void note_address_taken(const NODE* address) {
-    const NODE* t = address->left;
-    while (t && t->op == STDOT) t = t->left;
-    if (!t || t->op != NAME || !currfuninfo) return;
-    switch (t->u.sym->sclass) {
+    const NODE* object = name_of_place(static_cast<const NODE*>(address->left));
+    if (!object || !currfuninfo) return;
+    switch (object->u.sym->sclass) {
     case SC_AUTO:
     case SC_REGISTER:
     case SC_MEMORY:

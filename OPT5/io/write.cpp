@@ -9,6 +9,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/target/target.h"
 #include "UTIL/abort.h"
 
@@ -191,9 +192,8 @@ namespace {
 
 // The object that an address is taken of, or null.
 SYMTAB* addressed_object(const NODE* t) {
-    if (t->op != UAND && t->op != ARGREF) return nullptr;
-    for (t = t->left; t && t->op == STDOT;) t = t->left;
-    return t && t->op == NAME ? t->u.sym : nullptr;
+    const NODE* object = t->op == UAND || t->op == ARGREF ? name_of_place(static_cast<const NODE*>(t->left)) : nullptr;
+    return object ? object->u.sym : nullptr;
 }
 
 // One walk over what will be written: which locals it names and which have their address taken, and whether it calls.

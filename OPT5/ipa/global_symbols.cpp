@@ -9,6 +9,7 @@
 #include "OPT5/ipa/progana.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ipa/uses.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
@@ -31,8 +32,6 @@ void use(SYMTAB* sym, uint16_t bits) {
     if (sym && sym->level == 0 && !sym->is_function()) sym->cqual |= bits;
 }
 
-void written(const NODE* lvalue) { use(object_name_if_known(lvalue), CQ_REFERENCED | CQ_WRITTEN); }
-
 // As the scan of a definition enters uses: a written object, an address, a name.
 void rescan_symbol_uses(NODE* tree) {
     for_each_node(tree, [](NODE* t) {
@@ -41,21 +40,15 @@ void rescan_symbol_uses(NODE* tree) {
         case UMULT:
         case STREF: use(object_name_if_known(t), CQ_REFERENCED); return;
         case UAND:
-        case ARGREF: {
-            const NODE* object = t->left;
-            while (object && object->op == STDOT) object = object->left;
-            if (object && object->op == NAME)
+        case ARGREF:
+            if (const NODE* object = name_of_place(t->left))
                 use(object->u.sym, t->op == UAND ? CQ_REFERENCED | CQ_ALIASED : CQ_REFERENCED);
-            return;
+            break;
+        default: break;
         }
-        case MCALL:
-            for (int i = 0, n = arg_list_count(t->left); i < n; ++i)
-                if (NODE* arg = arg_list_lookup(t->left, i); arg->op == ARGREF) written(arg->left);
-            return;
-        default:
-            if (opcode_is_ASG(t->op)) written(t->left);
-            return;
-        }
+        for_each_write_of_node(t, [](const WRITE& w) {
+            if (w.place) use(object_name_if_known(w.place), CQ_REFERENCED | CQ_WRITTEN);
+        });
     });
 }
 

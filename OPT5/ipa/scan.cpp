@@ -9,6 +9,7 @@
 #include "OPT5/ipa/progana.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -46,12 +47,6 @@ void count_in(CALLEE** list, FUNINFO* f) {
             return;
         }
     *list = new CALLEE{f, 1, *list};
-}
-
-// The object behind an address operand: through STDOTs to a NAME.
-NODE* named_object(NODE* t) {
-    while (t && t->op == STDOT) t = t->left;
-    return t && t->op == NAME ? t : nullptr;
 }
 
 class SCAN {
@@ -110,7 +105,7 @@ public:
             if (t->left && compatible_types(t->type, t->left->type, false)) --f->size;
             break;
         default:
-            if (opcode_is_ASG(t->op)) {
+            if (writes_left_operand(t->op)) {
                 assignment(t);
                 return;
             }
@@ -160,7 +155,7 @@ private:
     }
 
     // What an assignment, or a machine operation through an argument, may write.
-    void written(NODE* lvalue) {
+    void written(const NODE* lvalue) {
         SYMTAB* object = object_name_if_known(lvalue);
         if (!object) {
             clear(FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg);
@@ -177,10 +172,10 @@ private:
         const bool outer = in_prolog;
         if (tree_is_arg_prolog(t)) in_prolog = true;
         tree(t->right, false);
-        written(t->left);
+        for_each_write_of_node(t, [this](const WRITE& w) { written(w.place); });
         NODE* target = t->left;
         if (t->op == ASG) {
-            if (NODE* object = named_object(target))
+            if (NODE* object = name_of_place(target))
                 target = object;
             else if (target->op == UMULT || target->op == STREF)
                 target = target->left;
@@ -206,7 +201,7 @@ private:
     }
 
     void address(NODE* t) {
-        if (NODE* object = named_object(t->left); object && object->u.sym->level == 0 && !object->u.sym->is_function())
+        if (const NODE* object = name_of_place(t->left); object && object->u.sym->level == 0 && !object->u.sym->is_function())
             object->u.sym->cqual |= CQ_REFERENCED | CQ_ALIASED;
         tree(t->left, false);
     }
@@ -267,9 +262,8 @@ private:
         clear(FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg | FUN_no_ind_use);
         // A copy to or from an object by its address is an access of that object.
         for (int i = 0; i < 2; ++i) {
-            NODE* place = arg_list_lookup(t->left, i);
-            while (place && place->op == PCONV) place = place->left;
-            NODE* object = place && place->op == UAND ? named_object(place->left) : nullptr;
+            const NODE* place = place_of_pointer(arg_list_lookup(t->left, i));
+            const NODE* object = place ? name_of_place(place) : nullptr;
             if (!object) continue;
             if (i == 0)
                 written(object);

@@ -18,11 +18,10 @@ public:
         return values[bb->serial];
     }
     typename std::vector<V>::const_reference operator[](const BBLK* bb) const {
-        return bb->serial < values.size() ? values[bb->serial] : initial_of_const();
+        return bb->serial < values.size() ? values[bb->serial] : initial;
     }
 
 private:
-    typename std::vector<V>::const_reference initial_of_const() const { return initial; }
     V initial;
     std::vector<V> values;
 };
@@ -30,7 +29,6 @@ private:
 // A set of blocks.
 class BLOCK_SET {
 public:
-    bool has(const BBLK* bb) const { return bb->serial < is_in.size() && is_in[bb->serial]; }
     // Whether it was not in before.
     bool add(const BBLK* bb) {
         if (bb->serial >= is_in.size()) is_in.resize(bb->serial + 1, false);

@@ -12,6 +12,7 @@
 #include "OPT5/ir/scope.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "UTIL/abort.h"
 #include "UTIL/safemem.h"
 
@@ -296,7 +297,7 @@ void remove_pragma(int kind, PRAGMA** list) {
 bool is_struct_explosion_parm_assignment(const NODE* a, const NODE* b) {
     if (!a || !b || a->op != NAME || b->op != STDOT) return false;
     if (std::strncmp(skip_name_prefix(a->u.sym->name), EXPLODED_PARM_PREFIX, sizeof EXPLODED_PARM_PREFIX - 1)) return false;
-    while (b->op == STDOT) b = b->left;
+    b = without_members(b);
     return b->op == NAME && b->u.sym->level == 1;
 }
 

@@ -45,8 +45,7 @@ bool tree_has_side_effects(const NODE* t) {
         case CSE_ORIG: t = t->right; continue;
         case NAME: return lvalue_is_volatile(t);
         case UAND: {
-            const NODE* object = t->left;
-            while (object->op == STDOT) object = object->left;
+            const NODE* object = without_members(static_cast<const NODE*>(t->left));
             if (object->op == NAME) return false;
             // The address of an indirection is computed, the indirection is not.
             t = object->op == UMULT || object->op == STREF ? object->left : object;
@@ -85,8 +84,7 @@ bool expr_is_constant(const NODE* t) {
         return t->u.sym && (t->u.sym->is_global() || t->u.sym->sclass == SC_STATIC) && !lvalue_is_volatile(t) &&
                lvalue_is_immutable(t);
     case UAND: {
-        const NODE* object = t->left;
-        while (object->op == STDOT) object = object->left;
+        const NODE* object = without_members(static_cast<const NODE*>(t->left));
         return object->op == NAME || (object->op == UMULT && !object->right && expr_is_constant(object->left));
     }
     case UMULT: return !t->right && !lvalue_is_volatile(t) && lvalue_is_immutable(t) && expr_is_constant(t->left);
@@ -217,8 +215,7 @@ bool lvalue_is_a_ref_parm(const NODE* t) {
 bool tree_addresses_an_argument(const NODE* t) {
     for (; t; t = t->left) {
         if (t->op == UAND || t->op == ARGREF) {
-            const NODE* object = t->left;
-            while (object->op == STDOT) object = object->left;
+            const NODE* object = without_members(static_cast<const NODE*>(t->left));
             if (object->op == NAME && object->u.sym && (object->u.sym->level == 1 || map_sym_to_parm(object->u.sym)))
                 return true;
         }
@@ -369,8 +366,7 @@ bool total_pointer_offset_value(const NODE* t, INT65* offset) {
 static bool is_object_address(const NODE* t) {
     if (t->op == SCON) return true;
     if (t->op != UAND) return false;
-    const NODE* object = t->left;
-    while (object->op == STDOT) object = object->left;
+    const NODE* object = without_members(static_cast<const NODE*>(t->left));
     return object->op == NAME && object->u.sym && !find_pragma(object->u.sym, PRG_WEAK);
 }
 

@@ -19,6 +19,7 @@
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
@@ -108,7 +109,7 @@ SPAN span_of(const fkMDATA* m, const TYPE* csu, bool is_volatile) {
 
 // Whether the address of what a member is selected from can be taken.
 bool is_place(const NODE* t) {
-    while (t->op == STDOT) t = t->left;
+    t = without_members(t);
     return t->op == NAME || t->op == UMULT || t->op == STREF;
 }
 

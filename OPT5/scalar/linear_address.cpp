@@ -2,6 +2,7 @@
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/simp.h"
 
@@ -97,8 +98,7 @@ bool LINEAR_ADDRESS::differs_by_constant(const LINEAR_ADDRESS& other) const {
 
 uint64_t LINEAR_ADDRESS::hash() const {
     auto of_name = [](const NODE* name) { return 0x9e3779b97f4a7c15u * static_cast<uint64_t>(name->u.sym->index + 1); };
-    const NODE* object = base;
-    while (object->op == UAND || object->op == STDOT) object = object->left;
+    const NODE* object = base->op == UAND ? without_members(static_cast<const NODE*>(base->left)) : base;
     uint64_t h = object->op == NAME ? of_name(object) : 7;
     for (const TERM& t : *this)
         h += (t.tree->op == NAME ? of_name(t.tree) : 11) * static_cast<uint64_t>(2 * t.coefficient + 1);

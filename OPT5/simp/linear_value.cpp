@@ -1,6 +1,7 @@
 #include "OPT5/simp/linear_value.h"
 
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/factor.h"
 
 namespace {
@@ -58,7 +59,7 @@ private:
 
 bool is_pure_within(const NODE* t, int* nodes_left) {
     for (; t; t = t->left) {
-        if (--*nodes_left < 0 || side_effects[t->op] || op_is_intrinsic(t->op)) return false;
+        if (--*nodes_left < 0 || op_has_effect(t->op) || op_is_intrinsic(t->op)) return false;
         if ((t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF) && lvalue_is_volatile(t))
             return false;
         if (!is_pure_within(t->right, nodes_left)) return false;

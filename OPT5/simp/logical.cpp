@@ -3,6 +3,7 @@
 // What is said of OROR holds for ANDAND with the roles of 0 and 1 exchanged. Two compares of one value with constants
 // are one compare where a mask or a range says it; two tests that are cheap and cannot trap are one operator on bits.
 
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/compare.h"
 #include "OPT5/simp/rule.h"
@@ -22,7 +23,7 @@ NODE* truth(NODE* t, bool value) { return mk_COMMAOP(peel_for_effect(t), mk_ICON
 
 // ---- Strict operands: what may be computed though the program would not have done so
 bool lvalue_is_inherently_strict(const NODE* t) {
-    while (t->op == STDOT) t = t->left;
+    t = without_members(t);
     return t->op == NAME && !lvalue_is_volatile(t);
 }
 

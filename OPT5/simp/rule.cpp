@@ -23,8 +23,7 @@ bool is_pure_within(const NODE* t, int* budget) {
             if (lvalue_is_volatile(t)) return false;
             break;
         case UAND: // the address of what a pointer leads to is computed, what is there isn't read
-            t = t->left;
-            while (t->op == STDOT) t = t->left;
+            t = without_members(static_cast<const NODE*>(t->left));
             if (t->op == NAME) return true;
             if (t->op == UMULT || t->op == STREF) {
                 if (t->op == UMULT && t->right && !is_pure_within(t->right, budget)) return false;

@@ -11,6 +11,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
 
@@ -87,8 +88,7 @@ bool left_is_plain_target(const NODE* t) { return opcode_is_ASG(t->op) && t->lef
 
 // `(a, *p) = e`: the effects are put back into the address, where their order against the value stays as it was.
 void put_effects_into_address(NODE* t) {
-    NODE *comma = t->left, *place = comma->right;
-    while (place->op == STDOT) place = place->left;
+    NODE *comma = t->left, *place = without_members(comma->right);
     if (place->op != UMULT && place->op != STREF) return;
     t->left = comma->right;
     comma->right = place->left;

@@ -47,7 +47,7 @@ void rescan_symbol_uses(NODE* tree) {
         default: break;
         }
         for_each_write_of_node(t, [](const WRITE& w) {
-            if (w.place) use(object_name_if_known(w.place), CQ_REFERENCED | CQ_WRITTEN);
+            if (w.place) use(object_name_if_known(object_of_place(w.place)), CQ_REFERENCED | CQ_WRITTEN);
         });
     });
 }

@@ -156,7 +156,7 @@ private:
 
     // What an assignment, or a machine operation through an argument, may write.
     void written(const NODE* lvalue) {
-        SYMTAB* object = object_name_if_known(lvalue);
+        SYMTAB* object = object_name_if_known(object_of_place(lvalue));
         if (!object) {
             clear(FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg);
             return;

@@ -5,6 +5,8 @@
 #include "../alias/alias_fixture.h"
 
 #include "OPT5/alias/effects.h"
+#include "OPT5/ipa/progana.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
 #include "OPT5/scalar/implied_tests.h"
@@ -12,7 +14,6 @@
 #include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/scalar/merge.h"
-#include "OPT5/ir/loops.h"
 #include "OPT5/scalar/simpcfg.h"
 
 #include <cstring>
@@ -104,6 +105,7 @@ public:
         return found;
     }
     using AliasTest::build;
+    using AliasTest::global;
     using AliasTest::keep;
     using AliasTest::member;
     using AliasTest::name;
@@ -316,5 +318,13 @@ TEST(WrittenPlaces, Signs) {
         true);
 }
 
+TEST(WrittenPlaces, GlobalsOfTheProgram) {
+    expect_seen("the scan of a definition", [](WORLD& w) {
+        SYMTAB* g = w.global("g", tp->int_t, SC_STATIC, 0);
+        set_flags(currfuninfo, FUN_no_global_asg);
+        scan_for_funinfo(w.keep(w.write_of(w.name(g))), true, currfuninfo, false);
+        return (g->cqual & CQ_WRITTEN) && !TEST_FLAG(currfuninfo, FUN_no_global_asg);
+    });
+}
 
 } // namespace

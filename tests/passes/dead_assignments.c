@@ -67,6 +67,13 @@ int conditional(int y) {
     return x;
 }
 
+// FUNCTION: under_a_condition
+// HAS: x = 5
+int under_a_condition(int y) {
+    int x = 5, seen = y > 3 && (x = y) > 7;
+    return x * 10 + seen;
+}
+
 static void look(const int *p) { g += *p; }
 
 // FUNCTION: address_taken
@@ -115,6 +122,7 @@ int main(void) {
     put_i16(g);
     put_i16(on_one_way(101) + on_one_way(5));
     put_i16(conditional(4) * 10 + conditional(3));
+    put_i16(under_a_condition(2) * 100 + under_a_condition(8));
     put_i16(address_taken(9));
     volatile_local();
     put_i16(embedded(8));

@@ -128,6 +128,16 @@ long bounded(unsigned n) {
     return s;
 }
 
+// From the greatest value on it meets the limit later, though the first test leaves for others above the limit.
+// FUNCTION: tested_late
+// COUNT 1: u += 1
+long tested_late(unsigned long u, unsigned long n) {
+    long s = 0;
+    do s = s * 3 + a[u + 1];
+    while (++u < n);
+    return s;
+}
+
 // FUNCTION: kept_volatile
 // COUNT 0: $O$P
 long kept_volatile(int n) {
@@ -201,6 +211,6 @@ int main(void) {
     put_i32(w[29] + w[7] * 3 + w[12] + a[8] +  pairs[39].x + pairs[3].y);
     put_i16(found(203));
     put_i32(wraps(3, w, 1) + bounded(9) + kept_volatile(9) + kept_aliased(9) + promised(4));
-    put_i32(changing_steps(60));
+    put_i32(changing_steps(60) + tested_late(-1UL, 5) * 7 + tested_late(9, 5));
     return 0;
 }

@@ -28,10 +28,22 @@ int discarded(int x) {
     return h;
 }
 
+// No effect moves ahead of what reads its place or writes what it reads.
+static int of_g(void) { return g * 10; }
+// FUNCTION: behind_its_reader
+// COUNT 1: of_g() + (_g = 3, _h)
+int behind_its_reader(void) { return of_g() + (g = 3, h); }
+
+// FUNCTION: behind_a_condition
+// HAS: /^return .*&& .*_g = .*_h = _g/
+int behind_a_condition(int x) { return (x > 5 && (g = x)) + (h = g, 3); }
+
 int main(void) {
     commas();
     put_i16(g + h);
     put_i16(header(5));
     put_i16(discarded(1));
+    put_i16(behind_its_reader());
+    put_i16(behind_a_condition(9) * 10 + h);
     return 0;
 }

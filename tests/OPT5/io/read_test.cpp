@@ -115,6 +115,17 @@ TEST_F(ReadTest, ABranchHintComesBackAsItWas) {
     EXPECT_NE(dump().find("__builtin_expect("), std::string::npos) << dump();
 }
 
+TEST_F(ReadTest, ABranchHintOnAValueWiderThanTheCallKeepsTheValue) {
+    IC_NODE* args = node(op::COMMA, pkg.long_t, name(global("_wide", pkg.llong_t)), icon(0, pkg.long_t));
+    begin_main();
+    unless(node(op::NEQ, pkg.int_t, intrinsic(op::ICALL, "__builtin_expect", pkg.long_t, args), icon(0)), 2);
+    set(y, icon(1));
+    label(2);
+    ret(name(y));
+    end();
+    expect_lines({"if (!(__builtin_expect(_wide, 0))) goto L2"});
+}
+
 // ---- Functions that are refused
 
 TEST_F(ReadTest, LabelsMustBeDefinedOnce) {

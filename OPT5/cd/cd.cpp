@@ -1,4 +1,4 @@
-// Not built yet. What is called here leaves the program as it is, and what it is asked is not known.
+// Not built yet: the passes leave the program as it is, and every question is answered with "not known".
 #include "OPT5/cd/cd.h"
 
 void do_cd_vectorization() {}

@@ -76,8 +76,7 @@ LBL* label_of_bb(BBLK* bb) {
 
 namespace {
 
-// The control statement of every block in list order. A block's list is walked to its end to find it, which is what
-// costs: callers that look twice keep the result.
+// The control statement of every block in list order, for callers that look more than once.
 std::vector<NODE*> collect_branches() {
     std::vector<NODE*> branches;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)

@@ -93,7 +93,7 @@ void erase_edge(EDGE* edge);
 void erase_edge_list(EDGE* list);
 void connect(BBLK* from, BBLK* to, double prob = -1.0); // both lists, unless it is there
 void disconnect(BBLK* from, BBLK* to);
-// The successor `from` of a block gives way to `to`, which may be one already.
+// The successor `from` of a block is replaced by `to`, which may be one already.
 struct SUCCESSOR_CHANGE {
     BBLK *from, *to;
 };

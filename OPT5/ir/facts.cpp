@@ -30,8 +30,8 @@ FACTS with_what_rests_on(FACTS gone) {
 } // namespace
 
 FACT_FINDER::FACT_FINDER(const char* name, FACTS fact, FACTS rests_on, void (*find)(FACTS), void (*forget)(),
-                         bool (*still_holds)(), FACTS on_the_way)
-    : name(name), rests_on(rests_on), on_the_way(on_the_way), find(find), forget(forget), still_holds(still_holds) {
+                         bool (*still_holds)(), FACTS found_too)
+    : name(name), rests_on(rests_on), found_too(found_too), find(find), forget(forget), still_holds(still_holds) {
     for (int i = 0; i < fact::count; ++i)
         if (fact >> i & 1) finders[i] = this;
 }
@@ -48,7 +48,7 @@ void need(FACTS wanted) {
     for (int i = 0; i < fact::count; ++i) {
         const FACTS one = FACTS(1) << i;
         if (!(wanted & ~f->facts & one)) continue;
-        const FACTS found = one | (finders[i]->on_the_way & wanted & ~f->facts);
+        const FACTS found = one | (finders[i]->found_too & wanted & ~f->facts);
         finders[i]->find(found);
         f->facts |= found;
     }

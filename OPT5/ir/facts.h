@@ -1,9 +1,8 @@
 // What is known of the current function, and whether it is true now.
 //
 // A pass asks for what it relies on with `need`, which finds what is not known, and says with `changed` what its work
-// left true; everything else is forgotten. Between the two a pass keeps its own books: it may change statements under a
-// fact that it keeps using, as long as it knows what that does to the fact. An edit of blocks or edges ends what
-// rests on the graph at once.
+// left true; everything else is forgotten. In between it may change statements and keep using a fact, as long as it
+// knows what the change does to that fact. An edit of blocks or edges ends at once what rests on the graph.
 //
 // A room that can find a fact defines a FACT_FINDER beside the code that finds it.
 #pragma once
@@ -32,15 +31,15 @@ constexpr int count = 7;
 struct FACT_FINDER {
     const char* name;
     FACTS rests_on;      // needed first; where one of these is forgotten, so is what rests on it
-    FACTS on_the_way;    // what the same walk finds beside it where that is wanted too
-    void (*find)(FACTS); // the fact and what of `on_the_way` is given, for the current function
+    FACTS found_too;     // what the same walk also finds where that is wanted
+    void (*find)(FACTS); // the fact and what of `found_too` is given, for the current function
     void (*forget)();    // gives back what the fact holds in memory; may be null
     // For validation: finds it anew and compares; on return the fact is as it was or found anew. True if what was known
     // is still so. May be null.
     bool (*still_holds)();
 
     FACT_FINDER(const char* name, FACTS fact, FACTS rests_on, void (*find)(FACTS), void (*forget)() = nullptr,
-                bool (*still_holds)() = nullptr, FACTS on_the_way = fact::none);
+                bool (*still_holds)() = nullptr, FACTS found_too = fact::none);
     FACT_FINDER(const FACT_FINDER&) = delete;
     FACT_FINDER& operator=(const FACT_FINDER&) = delete;
 };

@@ -1,10 +1,10 @@
 // The grammar of trees: every node stands where its operator may stand, under operands that it can have.
 //
-// The I-file's records fix how many operands a node has, not what they are. What is refused is what no parser writes and
-// what the optimizer could only misread: a label used as a value, a case outside a switch, an indirection through what is
-// no pointer, a sum of structures. Operands may have other types than their operator, since parsers leave casts out; but
-// what no cast could make of them is refused. Behind the check of the input the walkers of the optimizer rely on the shapes, and validation between the
-// rows of the pipeline holds every pass to them.
+// The I-file's records fix how many operands a node has, not what they are. Trees that no parser writes are refused: a
+// label used as a value, a case outside a switch, an indirection through what is no pointer, a sum of structures.
+// Parsers leave casts out, so an operand may have another type than its operator, as long as a cast could convert it.
+// The input is checked once; the optimizer's walkers then rely on the shapes, and validation between the rows of the
+// pipeline holds every pass to them.
 #pragma once
 
 #include <string>

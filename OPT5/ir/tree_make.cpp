@@ -113,7 +113,8 @@ NODE* mk_MCALL(const char* name, NODE* args, TYPE* type) {
 // ---- Compound assignment
 //
 // `x op= e` evaluates e before it reads x, and computes in the combined type of both before it converts to x's type;
-// `x = x op e` reads x first and computes in the operator's type. Each direction holds only where neither shows.
+// `x = x op e` reads x first and computes in the operator's type. One may replace the other only where neither
+// difference can be seen.
 bool compound_ASG_computes_in(TYPE* wanted, int op, const NODE* x, const NODE* e) {
     if (x->type->is_vector() || wanted->is_vector())
         return equiv_mtypes(x->type, wanted) && equiv_mtypes(e->type, wanted);

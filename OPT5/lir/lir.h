@@ -1,6 +1,6 @@
 // The low-level form of a function.
 #pragma once
 
-// The hooks of steps "early LIR" and "late LIR".
+// The steps "early LIR" and "late LIR".
 void early_LIR();
 void late_LIR();

@@ -9,10 +9,10 @@
 // copied as a whole, too, and a union, becomes one integer variable, in which the fields lie as they did.
 //
 // Needs: nothing. Leaves: what rests on the graph; symbols are split anew where there are new ones.
-// Sound because the other bits of a unit can belong to nothing but fields. A container that would reach past the
-// structure or hold what is no field, which a store would write back too late, is not touched: such an access stays as
-// it is, and so does a field across units on a target whose numbers start with the high unit. What is evaluated once
-// stays so: an address or a value with side effects is kept in a variable ahead of the store.
+// Sound because a container holds nothing but fields. Where it would reach past the structure, or hold another member,
+// to which the store would write back an old value, the access stays as it is; and so does a field across units on a
+// target whose numbers start with the high unit. What is evaluated once stays so: an address or a value with side
+// effects is kept in a variable ahead of the store.
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"

@@ -7,9 +7,9 @@
 //
 // Needs: block numbers. Leaves: a simplified graph with block numbers.
 // Sound because the statements in front of the test, the tail, are copied whole and may not change what the condition
-// reads: with `T` assigning to `c` the second test would have to be asked again. A test on whose outcome all edges agree,
-// or that has no tail, needs no copy and is removed with the redundant tests. A test that closes or heads a loop stays, so
-// that the loop keeps one entry and one back edge.
+// reads: with `T` assigning to `c` the second test would have to be asked again. A test that all edges decide alike, or
+// that has no tail, needs no copy: OPT5/scalar/implied_tests.cpp removes it. A test that closes or heads a loop stays,
+// so that the loop keeps one entry and one back edge.
 //
 // Growth is bounded: a tail is a few nodes, all copies together a part of the function, and where size is the goal
 // there are none.

@@ -2,7 +2,7 @@
 //
 // A block is compared with those of the same shape alone: the opcodes of its statements make a key.
 //
-// Needs: nothing. Leaves: unreachable blocks and the numbers of before, for `rebuildcfg`.
+// Needs: nothing. Leaves: unreachable blocks and stale block numbers, which `rebuildcfg` mends.
 // Sound because only code is shared: the block that stays does what the removed one did, so nothing is evaluated more
 // or less often or in another order, and side effects are no obstacle. The entry block never takes a predecessor: its
 // parameters would be set anew.

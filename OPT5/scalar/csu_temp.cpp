@@ -1,14 +1,14 @@
 // Structure results are built where they are wanted.
 //
 // A call's result that is stored to a temporary, and from there to a local, is stored to the local. A function that
-// returns a structure through a hidden pointer, and fills a local that every path copies to where that points, fills
-// the place itself.
+// returns a structure through a hidden pointer may build it in a local and copy that through the pointer on every path:
+// it builds the structure where the pointer points instead.
 //
 // Needs: alias marks. Leaves: what rests on the graph.
 // Sound because, of a call's result, nothing else names the temporary, and neither the call nor anything outside of
 // this function can see the local: a callee that reads the local while it writes its result would read the new value.
-// Of a hidden pointer, the place is an object of the caller that nothing else names before the function returns; the
-// pointer is used for nothing but the copies, and no copy is followed by anything that could still change the local.
+// A hidden pointer points to an object of the caller that nothing else names before the function returns; the pointer
+// is used for nothing but the copies, and no copy is followed by anything that could still change the local.
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"

@@ -7,8 +7,8 @@
 // variables that only feed each other: they are found without regard to flow, and their reads don't count.
 //
 // Needs: live variables. Leaves: a simplified graph with block numbers; the sets of live variables are forgotten.
-// Sound because what a dead assignment computes stays for its effects, and the sets of other blocks, which are not
-// recomputed, are too large and so safe. A variable that is not a candidate is live everywhere.
+// Sound because the effects of a removed value stay. The sets of the other blocks are not recomputed and can only be
+// too large: then less is removed. A variable that is not a candidate is live everywhere.
 
 #include "OPT5/scalar/eda.h"
 
@@ -46,7 +46,7 @@ bool is_combinable(const LIST* first, const LIST* second) {
         return false;
     if (tree_is_arg_prolog(a) || tree_is_arg_prolog(b) || lvalue_is_volatile(a->left)) return false;
     if (sym_appears_in_tree(a->left->u.sym, b->left)) return false;
-    // The store goes where it went, after everything that the value takes.
+    // The store still comes last: the address of `b`'s place is then evaluated ahead of the value, which must not show.
     return b->left->op == NAME || (!tree_has_side_effects(a->right) && !tree_has_side_effects(b->left));
 }
 
@@ -194,7 +194,7 @@ private:
         const int from = live_index(t->right->u.sym);
         if (from < 0 || live.test(static_cast<uint32_t>(from))) return copy;
         copy.to = t->left->op == NAME ? live_index(t->left->u.sym) : -1;
-        if (copy.to >= 0 && !live.test(static_cast<uint32_t>(copy.to))) return copy; // it goes
+        if (copy.to >= 0 && !live.test(static_cast<uint32_t>(copy.to))) return copy; // will be removed
         copy.cell = s;
         copy.from = from;
         return copy;

@@ -3,7 +3,7 @@
 // `if (c) x = a; else x = b;` and `return c ? a : b` in two blocks cost two jumps; as one statement the code generator
 // may use a conditional instruction, or the target's minimum and maximum.
 //
-// Needs: nothing. Leaves: unreachable blocks for `rebuildcfg`.
+// Needs: nothing. Leaves: unreachable blocks, which `rebuildcfg` removes.
 // Sound because the condition is evaluated first as before, and the code generator, which may then compute both arms,
 // finds none that has a side effect or needs the condition as its guard: `if (p) x = *p;` stays.
 

@@ -6,11 +6,12 @@
 // Earlier in the pipeline this would leave loops with two entries, or a body behind no test at all; here only the
 // layout is left to do.
 //
-// Needs: block numbers, which are layout positions here, and alias marks. Leaves: unreachable blocks for `rebuildcfg`.
+// Needs: block numbers, which are layout positions here, and alias marks.
+// Leaves: unreachable blocks, which `rebuildcfg` removes.
 // Sound because the condition becomes a constant by values that the block in front assigns to variables that only their
 // NAMEs reach, as constants and such variables; a statement in between that names one of them in any other form ends
-// the search. A promise of iterations is about the loop whose label follows in the text, so behind one only what is
-// next in the text may be entered.
+// the search. A pragma that promises iterations speaks of the loop whose label follows it in the text, so that a block
+// which ends in one may only lead to the next block of the text.
 
 #include "OPT5/scalar/simpcfg.h"
 

@@ -5,7 +5,7 @@
 // Where every edge into the block is decided alike, the test is removed; where a block is nothing but the test, a
 // single edge into it is led past it.
 //
-// Needs: block numbers. Leaves: unreachable blocks for `rebuildcfg`.
+// Needs: block numbers. Leaves: unreachable blocks, which `rebuildcfg` removes.
 // Sound because nothing between the two tests may change what q reads: in `if (*p > 3) { f(); if (*p > 3) ...}` the
 // call may. No edge is led past the head of a loop: the loop would have a second entry.
 
@@ -291,7 +291,7 @@ bool has_back_edge(const BBLK* bb) {
 
 namespace {
 
-// The assignment of a block behind `test` alone that assigns one cheap value and goes on to `join`, or null.
+// The assignment of a block behind `test` alone that assigns one cheap value and then jumps to `join`, or null.
 const NODE* arm_of_select(const BBLK* arm, const BBLK* test, const BBLK* join) {
     if (!arm->predecessors || arm->predecessors->rest || arm->predecessors->first != test) return nullptr;
     const LIST* s = arm->statements;

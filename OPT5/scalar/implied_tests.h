@@ -17,11 +17,12 @@ struct LIST;
 int pred_implies_pred(const NODE* p, bool sense, const NODE* q);
 
 bool is_test(const NODE* control); // an IF on a value
-// A loop's test is left where it is: an edge that passed it would enter the loop in its middle.
+// Tests of such blocks are left where they are: an edge past a loop's test would enter the loop in its middle.
 bool has_back_edge(const BBLK* bb);
 
-// What a condition is on the edges into its block. Valid while the graph of the blocks that it saw stands; blocks made
-// later decide nothing. After `ask_for` the other questions are about that condition.
+// Whether a condition is true or false on the edges into its block. Valid while the blocks that the graph had at
+// construction keep their edges; blocks made later decide nothing. `ask_for` names the condition that the other
+// questions are about.
 class TEST_OUTCOMES {
 public:
     TEST_OUTCOMES();
@@ -30,8 +31,8 @@ public:
     bool ask_for(NODE* condition);    // false if nothing can be said of it; borrowed
     // At the end of `pred`, where it assigns a constant to the variable of the condition.
     std::optional<bool> behind_constant(const BBLK* pred);
-    // On the edge from `pred` to `bb`, by an earlier test: found back along sole predecessors, if nothing between the two
-    // changes what the condition reads.
+    // On the edge from `pred` to `bb`, by an earlier test. That is looked for in `pred` and back along sole
+    // predecessors; nothing behind it may change what the condition reads.
     std::optional<bool> on_edge(const BBLK* pred, const BBLK* bb);
     // The first statement of the block that may change what the condition reads, or null. The control statement is not
     // looked at; in a very long block the last statement that was looked at is given.
@@ -60,8 +61,9 @@ struct DECIDED_EDGE {
     bool outcome;
     bool by_constant; // not by a test
 };
-// Whether the test at the end of `bb` and the one that `from` comes from each only choose a value for a variable: as
-// two selects they cost no jump, which an edge past the second would.
+// Whether the test at the end of `bb` and the one in front of `from` each only choose a value for a variable. They are
+// left alone: two selects cost no jump, an edge past the second would cost one.
 bool joins_selects(TEST_OUTCOMES& outcomes, const BBLK* from, const BBLK* bb);
-// Adds the edges into `bb` on which the outcome is known; returns whether those are all. Of very many not all are found.
+// Adds the edges into `bb` on which the outcome is known; returns whether those are all. Where very many edges lead
+// into it some are not looked at.
 bool find_outcomes(TEST_OUTCOMES& outcomes, const BBLK* bb, std::vector<DECIDED_EDGE>* edges);

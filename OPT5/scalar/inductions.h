@@ -36,7 +36,7 @@ struct LOOP_TEST {
     NODE* branch = nullptr;       // the IF
     INDUCTION* counter = nullptr; // which has one step in each iteration, by a constant
     const NODE* limit = nullptr;  // invariant
-    int stay_op = 0;              // the loop goes on while `counter stay_op limit`
+    int stay_op = 0;              // control stays in the loop while `counter stay_op limit`
     bool stays_if_true = false;   // of the compare as it stands
     bool step_comes_first = false;
 };

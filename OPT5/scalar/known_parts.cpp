@@ -1,7 +1,7 @@
 // Parts of objects whose value a variable or a constant is known to hold: a later load takes that.
 //
-// `part = value` and `variable = part` make a fact; what may change the part, its address or the value ends it. Facts
-// go on into the next block where that is entered from this one alone.
+// `part = value` and `variable = part` make a fact; what may change the part, its address or the value ends it. A block
+// with one predecessor begins with the facts that hold at that one's end.
 //
 // Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph.
 // Sound because a load is replaced only where it is evaluated before its statement changes anything: in `a = p->x +
@@ -81,7 +81,7 @@ private:
 
     void reuse_in_arguments(NODE* call) { call->right = reuse_in_value(call->right); }
 
-    // An object, not its value; a pointer on the way to it is a value.
+    // The place is not read, but a pointer that its address is computed from is.
     NODE* reuse_in_place(NODE* t) {
         auto* object = const_cast<NODE*>(get_first_non_stdot_node_down_the_left_side_of_tree(t));
         if (object->op == UMULT || object->op == STREF) object->left = reuse_in(object->left);

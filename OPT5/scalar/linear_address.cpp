@@ -44,7 +44,7 @@ private:
         const TYPE *from = cast->left->type, *to = cast->type;
         if (!is_plain_integer(from) || from->size > to->size) return false;
         if (from->size == to->size) return to->size == ADDRESS_BITS || from->is_unsigned() == to->is_unsigned();
-        return to->size == ADDRESS_BITS; // by its own sign; a narrower result could still be read the other way
+        return to->size == ADDRESS_BITS; // a narrower result may be extended once more, by another sign
     }
     static int64_t value_of(const NODE* icon) { return icon->u.lval.fits_in<int64_t>(); }
 
@@ -64,7 +64,7 @@ private:
         return address.add(t, k) && address.term_count() <= MOST_TERMS;
     }
 
-    // What variables held where it was computed is not known here, but of inductions.
+    // Its variables may have changed since it was computed: only what `leaf` takes without asking for values counts.
     bool of_value(const NODE* value, int64_t k) {
         in_value = true;
         const bool is_linear = read(value, k);

@@ -2,8 +2,8 @@
 //
 // Needs: block numbers, which are layout positions here. Leaves: them.
 // Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does not
-// fall into its successor. What a pragma promises of the loop behind it in the text is the one thing that layout could
-// break, so no block moves in between.
+// fall into its successor. Only a pragma that promises something of the loop behind it in the text depends on the
+// layout, so no block moves in between.
 
 #include "OPT5/scalar/simpcfg.h"
 

@@ -30,8 +30,8 @@ namespace {
 
 constexpr int MAX_THREADED_JUMPS = 20;
 
-// Where a block leads that holds nothing but a jump; null for any other block. The entry stays, since nothing may jump
-// to the block behind it in its place, and so does a block that jumps to itself.
+// The target of a block that holds nothing but a jump; null for any other block. The entry stays, since nothing may
+// jump to the block behind it in its place, and so does a block that jumps to itself.
 BBLK* bypass_of(const BBLK* bb) {
     const LIST* only = bb->statements;
     if (!only || only->rest || only->first->op != BRANCH || bb == currfuninfo->bb_list || bb->is_in_LIR_form())
@@ -40,7 +40,8 @@ BBLK* bypass_of(const BBLK* bb) {
     return target == bb ? nullptr : target;
 }
 
-// The block that a jump to `via` gets to in the end; `via` itself if that does more than jump, and in a ring of jumps.
+// The block at the end of a chain of jumps that begins with `via`: `via` itself if that does more than jump, or if the
+// jumps lead back to it.
 BBLK* end_of_jumps(BBLK* via) {
     BBLK* target = via;
     for (int jump = 0; jump < MAX_THREADED_JUMPS; ++jump) {
@@ -52,11 +53,11 @@ BBLK* end_of_jumps(BBLK* via) {
     return target;
 }
 
-// What control statements name in place of blocks that only jump; looked up alone.
+// For blocks that only jump: what control statements name in their place. Looked up, never walked.
 class REPLACEMENTS {
 public:
     void add(BBLK* from, BBLK* to) {
-        // The end of more jumps than are followed at once may be replaced in its turn.
+        // A chain longer than `end_of_jumps` follows: its last block may itself be replaced later.
         if (targets.count(from))
             for (auto& [_, target] : to_of)
                 if (target == from) target = to;
@@ -77,8 +78,8 @@ private:
 
 bool is_written_as_do(const PRAGMA* p) { return p->kind == PRG_SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
 
-// A loop that has nothing but its test left, which stood on top, evaluates that once more than it has iterations: a pragma
-// in front of it promised something of the iterations, and a reader would take it for the tests.
+// A loop that has nothing but its test left, which stood on top, evaluates that once more than it has iterations: a
+// pragma in front of it promised something of the iterations, and a reader would take it for the tests.
 void drop_promises_of(BBLK* loop) {
     for (const EDGE* e = loop->predecessors; e; e = e->rest) {
         if (e->first == loop) continue;
@@ -162,8 +163,8 @@ private:
     LIST*& control_of(const BBLK* bb) { return controls[bb->dfn]; }
     bool is_live(const BBLK* bb) { return control_of(bb) != nullptr; }
 
-    // A block without predecessors is removed, and with it the successors whose last predecessor it was. The objects stay for
-    // `rebuildcfg`, which also finds the rings that nothing enters.
+    // A block without predecessors is removed, and with it the successors whose last predecessor it was. The objects
+    // stay for `rebuildcfg`, which also finds the rings that nothing enters.
     void remove(BBLK* bb) {
         std::vector<BBLK*> work{bb};
         while (!work.empty()) {
@@ -205,8 +206,8 @@ private:
         return list;
     }
 
-    // Each successor that only jumps on is replaced by the block that it jumps to. The control statement, which may have
-    // thousands of targets, is rewritten in one walk.
+    // Each successor that only jumps on is replaced by the block that it jumps to. The control statement, which may
+    // have thousands of targets, is rewritten in one walk.
     bool thread(BBLK* bb) {
         std::vector<SUCCESSOR_CHANGE> changes;
         for (const EDGE* e = bb->successors; e; e = e->rest) {

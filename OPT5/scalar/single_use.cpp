@@ -1,7 +1,7 @@
 // Temporaries that are set once and read once, both in one block: the value is computed where it is read.
 //
-// Needs: the bits of the candidates of live variables. Leaves: the bits and the sets of all blocks: a temporary of one
-// block was in none; what rests on the graph.
+// Needs: live variables. Leaves: what rests on the graph, and live variables: no block's sets hold a temporary that
+// lives in one block.
 // Sound because what moves has no effects, and past other statements it moves only if it reads nothing but variables
 // that their NAMEs alone reach, none of which is assigned in between. A value that is loaded moves into the next
 // statement alone, and only if that does nothing before it reads it: in `t = *p; *q = 1; x = t` the store may meet the

@@ -1,7 +1,7 @@
 // Superblocks of the graph as it is: chains of blocks of which each but the first is entered from the one before alone.
 //
-// What one block knows of its variables holds in the next, so constants and copies that are assigned in the chain are
-// put in the place of later reads.
+// What is known of variables at the end of one block holds at the start of the next, so that constants and copies
+// assigned in a chain replace later reads.
 //
 // Needs: alias marks. Leaves: a simplified graph with block numbers where anything was replaced.
 // Sound because an assignment to a variable ends what is known of it and of its copies, and only variables take part
@@ -145,8 +145,8 @@ BBLK* only_predecessor(const BBLK* bb) {
     return e && !e->rest ? e->first : nullptr;
 }
 
-// Each block goes to the chain of its only predecessor if that ends there; the graph's order sees the predecessor
-// first.
+// A block joins the chain of its only predecessor if that is the chain's last block. Predecessors come first in the
+// order of the graph.
 std::vector<std::unique_ptr<SBLK>> form_superblocks() {
     std::vector<std::unique_ptr<SBLK>> superblocks;
     SBLK::next_number = 1;

@@ -300,7 +300,7 @@ private:
         set_statements(bb, bb->statements);
     }
 
-    // Each value goes through a temporary, or away if only its effects count.
+    // A value is computed into a temporary; of one that no parameter takes only the effects stay.
     template <class F>
     static void evaluate_in_order(std::vector<NEW_VALUE>& values, const F& add) {
         for (NEW_VALUE& v : values) {

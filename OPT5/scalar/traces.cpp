@@ -6,8 +6,8 @@
 //
 // Needs: block numbers, frequencies of a profile. Leaves: block numbers, which are layout positions.
 // Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does
-// not fall into its successor. Only what a pragma promises of the loop behind it in the text would come to speak of
-// another loop, so the block behind one stays there.
+// not fall into its successor. Only a pragma that promises something of the loop behind it in the text would speak of
+// another loop then, so the block behind one stays there.
 
 #include "OPT5/scalar/sblk.h"
 #include "OPT5/scalar/simpcfg.h"

@@ -165,15 +165,7 @@ void erase_bblock(BBLK* bb) {
     bb->label = nullptr;
     erase_edge_list(bb->predecessors);
     erase_edge_list(bb->successors);
-    bb->predecessors = bb->successors = bb->cursor = nullptr;
-    erase_edge_list(bb->descendants);
-    bb->descendants = nullptr;
-    erase_tree(bb->trips);
-    bb->trips = nullptr;
-}
-
-void clear_visited() {
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->visited = false;
+    bb->predecessors = bb->successors = nullptr;
 }
 
 bool BB_is_in_bb_list(const BBLK* bb) {

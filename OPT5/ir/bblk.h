@@ -34,24 +34,16 @@ public:
     LIST* statements = nullptr; // changed through OPT5/ir/statements.h
     EDGE* predecessors = nullptr;
     EDGE* successors = nullptr;
-    EDGE* cursor = nullptr;
     LBL* label = nullptr; // chained through LBL::next, owned
     struct LOOP* loop = nullptr;
-    void* lcv = nullptr;
-    NODE* trips = nullptr;
-    INT65 increment;
     // Live in, live out, use, def and three working sets.
     BITVEC* live_sets[7] = {};
-    EDGE* descendants = nullptr;
     PSN* first_psn = nullptr;
     PSN* last_psn = nullptr;
-    void* trace = nullptr;
     double dFreqIn = -1.0, dFreqOut = -1.0;
     int uon = 0; // source order number from 1; -1 for a block made after `buildcfg`
     int dfn = 0;
     uint8_t depth = 0; // of loops around it, as `allocate_regs` counted them
-    bool visited = false;
-    int cycle_count = -1;
 
     mutable LIST* control = nullptr; // the cell that `last_statement` found; null: to be found
 
@@ -75,7 +67,6 @@ BBLK* insert_new_bb(int uon, BBLK* after, LIST* list);
 BBLK* insert_new_bb_with_branch(int uon, BBLK* after, BBLK* target, PSN* psn);
 void delink_old_bb(BBLK* bb);
 void erase_bblock(BBLK* bb); // its statements, labels and edges; the object stays
-void clear_visited();
 
 // ---- Edges
 EDGE* mkedge(BBLK* bb, EDGE* rest);

@@ -8,6 +8,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/trees.h"
 #include "UTIL/abort.h"
 
@@ -200,23 +201,26 @@ void order_successors(BBLK* bb) {
 
 // Reverse postorder; returns the new list. Blocks that it does not reach keep dfn 0.
 BBLK* depth_first_order(BBLK* entry) {
-    std::vector<BBLK*> stack{entry};
+    struct VISIT {
+        BBLK* bb;
+        const EDGE* next; // to be followed from it
+    };
+    std::vector<VISIT> stack{{entry, entry->successors}};
     BBLK* finished = nullptr;
     entry->dfn = 1;
-    entry->cursor = entry->successors;
     while (!stack.empty()) {
-        BBLK* bb = stack.back();
-        if (EDGE* e = bb->cursor) {
-            bb->cursor = e->rest;
-            if (e->first->dfn) continue;
-            e->first->dfn = 1;
-            e->first->cursor = e->first->successors;
-            stack.push_back(e->first);
+        auto& [bb, next] = stack.back();
+        if (next) {
+            BBLK* to = next->first;
+            next = next->rest;
+            if (to->dfn) continue;
+            to->dfn = 1;
+            stack.push_back({to, to->successors});
             continue;
         }
-        stack.pop_back();
         bb->dflink = finished;
         finished = bb;
+        stack.pop_back();
     }
     return finished;
 }
@@ -246,18 +250,13 @@ void number_blocks(FUNINFO* f, BBLK* all) {
         erase_edge_list(bb->predecessors);
         bb->predecessors = nullptr;
         bb->dfn = 0;
-        bb->visited = false;
     }
     for (BBLK* bb = all; bb; bb = bb->uolink) order_successors(bb);
     f->bb_list = depth_first_order(entry);
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
-        OPT_ASSERT(!bb->visited);
-        bb->visited = true;
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
         for (const EDGE* e = bb->successors; e; e = e->rest)
             e->first->predecessors = new EDGE{bb, e->prob, e->first->predecessors};
-    }
     drop_unreachable_blocks(f, all);
-    clear_visited();
     renumber_bblocks();
     edges_were_changed(f);
 }
@@ -265,13 +264,10 @@ void number_blocks(FUNINFO* f, BBLK* all) {
 // Every block on one `uolink` chain: source order from the entry, then those that a pass put outside it.
 BBLK* chain_in_source_order(FUNINFO* f) {
     std::vector<BBLK*> blocks;
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) bb->visited = false;
-    for (BBLK* bb = f->bb_list; bb && !bb->visited; bb = bb->uolink) {
-        bb->visited = true;
-        blocks.push_back(bb);
-    }
+    BLOCK_SET seen;
+    for (BBLK* bb = f->bb_list; bb && seen.add(bb); bb = bb->uolink) blocks.push_back(bb);
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
-        if (!bb->visited) blocks.push_back(bb);
+        if (seen.add(bb)) blocks.push_back(bb);
     for (size_t i = 0; i < blocks.size(); ++i) blocks[i]->uolink = i + 1 < blocks.size() ? blocks[i + 1] : nullptr;
     return blocks.empty() ? nullptr : blocks.front();
 }

@@ -5,6 +5,7 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
@@ -118,24 +119,23 @@ void disconnect(BBLK* from, BBLK* to) {
 }
 
 void change_successors(BBLK* bb, const std::vector<SUCCESSOR_CHANGE>& changes) {
-    for (EDGE* e = bb->successors; e; e = e->rest) e->first->visited = true; // a successor
+    SMALL_BLOCK_SET successors;
+    for (const EDGE* e = bb->successors; e; e = e->rest) successors.add(e->first);
     EDGE* fresh = nullptr;
     std::unordered_map<const BBLK*, double> prob_of; // looked up alone
     for (const SUCCESSOR_CHANGE& c : changes) prob_of[c.from] = -1.0;
     for (const EDGE* e = bb->successors; e; e = e->rest)
         if (auto gone = prob_of.find(e->first); gone != prob_of.end()) gone->second = e->prob;
     for (const SUCCESSOR_CHANGE& c : changes) {
-        c.from->visited = false;
+        successors.remove(c.from);
         c.from->predecessors = remove_edge(bb, c.from->predecessors);
-        if (c.to->visited) continue;
-        c.to->visited = true;
+        if (!successors.add(c.to)) continue;
         fresh = new EDGE{c.to, prob_of[c.from], fresh};
         c.to->predecessors = new EDGE{bb, fresh->prob, c.to->predecessors};
     }
     EDGE** link = &bb->successors;
     while (EDGE* e = *link) {
         if (!prob_of.count(e->first)) {
-            e->first->visited = false;
             link = &e->rest;
             continue;
         }
@@ -143,12 +143,10 @@ void change_successors(BBLK* bb, const std::vector<SUCCESSOR_CHANGE>& changes) {
         delete e;
     }
     for (EDGE* e = fresh; e; e = e->rest) {
-        e->first->visited = false;
-        if (!e->rest) {
-            e->rest = bb->successors;
-            bb->successors = fresh;
-            break;
-        }
+        if (e->rest) continue;
+        e->rest = bb->successors;
+        bb->successors = fresh;
+        break;
     }
     edges_were_changed(bb->owner());
 }
@@ -156,17 +154,12 @@ void change_successors(BBLK* bb, const std::vector<SUCCESSOR_CHANGE>& changes) {
 // ---- Targets of control statements
 
 EDGE* list_branch_targets(NODE* tree, EDGE* list) {
-    // A block may be the target of many cases: `visited` marks what is on the list already.
-    std::vector<BBLK*> fresh;
-    for (EDGE* e = list; e; e = e->rest) e->first->visited = true;
+    SMALL_BLOCK_SET listed; // a block may be the target of many cases
+    for (const EDGE* e = list; e; e = e->rest) listed.add(e->first);
     for_each_branch_target(tree, [&](NODE* ref) {
         BBLK* target = ref->lbl ? ref->lbl->bblock : nullptr;
-        if (!target || target->visited) return;
-        target->visited = true;
-        fresh.push_back(target);
-        list = mkedge(target, list);
+        if (target && listed.add(target)) list = mkedge(target, list);
     });
-    for (EDGE* e = list; e; e = e->rest) e->first->visited = false;
     return list;
 }
 

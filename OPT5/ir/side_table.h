@@ -4,6 +4,8 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 
+#include <algorithm>
+#include <unordered_set>
 #include <vector>
 
 // A vector by serial number: constant time, no hashing, no field of the block that two passes could both take for theirs.
@@ -42,4 +44,34 @@ public:
 
 private:
     std::vector<bool> is_in;
+};
+
+// A set that takes no more room than its members, for what is made anew for each block: most blocks have one or two
+// successors, but a switch may have thousands.
+class SMALL_BLOCK_SET {
+public:
+    // Whether it was not in before.
+    bool add(const BBLK* bb) {
+        if (find(bb) != few + count || many.count(bb)) return false;
+        if (count < FEW)
+            few[count++] = bb;
+        else
+            many.insert(bb);
+        return true;
+    }
+    // Whether it was in.
+    bool remove(const BBLK* bb) {
+        const BBLK** at = find(bb);
+        if (at == few + count) return many.erase(bb) != 0;
+        *at = few[--count];
+        return true;
+    }
+
+private:
+    static constexpr size_t FEW = 8;
+    const BBLK** find(const BBLK* bb) { return std::find(few, few + count, bb); }
+
+    const BBLK* few[FEW];
+    size_t count = 0;
+    std::unordered_set<const BBLK*> many; // the rest; membership only
 };

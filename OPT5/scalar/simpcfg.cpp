@@ -16,6 +16,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -297,20 +298,18 @@ bool resync_edges(BBLK* bb) {
     NODE* control = bb->branch();
     if (!control || bb->is_in_LIR_form()) return false;
     EDGE* targets = list_branch_targets(control, nullptr);
-    for (EDGE* e = targets; e; e = e->rest) e->first->visited = true; // until its edge is found
+    SMALL_BLOCK_SET missing; // targets whose edge is not found yet
+    for (const EDGE* e = targets; e; e = e->rest) missing.add(e->first);
     bool changed = false;
     for (EDGE* e = bb->successors; e;) {
         BBLK* old = e->first;
         e = e->rest;
-        const bool stays = old->visited;
-        old->visited = false;
-        if (stays) continue;
+        if (missing.remove(old)) continue;
         disconnect(bb, old);
         changed = true;
     }
     for (EDGE* e = targets; e; e = e->rest) {
-        if (!e->first->visited) continue;
-        e->first->visited = false;
+        if (!missing.remove(e->first)) continue;
         connect(bb, e->first);
         changed = true;
     }

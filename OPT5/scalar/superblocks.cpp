@@ -15,6 +15,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/seq.h"
@@ -150,14 +151,17 @@ BBLK* only_predecessor(const BBLK* bb) {
 std::vector<std::unique_ptr<SBLK>> form_superblocks() {
     std::vector<std::unique_ptr<SBLK>> superblocks;
     SBLK::next_number = 1;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->trace = nullptr;
+    SIDE_TABLE<SBLK*> chain_of; // null: not looked at yet
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
         const BBLK* before = only_predecessor(bb);
-        auto* chain = before ? static_cast<SBLK*>(before->trace) : nullptr;
-        if (chain && chain->tail == before)
+        SBLK* chain = before ? chain_of[before] : nullptr;
+        if (chain && chain->tail == before) {
             chain->add_basic_block(bb);
-        else
+        } else {
             superblocks.push_back(std::make_unique<SBLK>(bb));
+            chain = superblocks.back().get();
+        }
+        chain_of[bb] = chain;
     }
     return superblocks;
 }
@@ -177,6 +181,5 @@ void optimize_superblocks_in_cfg() {
         for (BBLK* bb : superblock->contents)
             if (!bb->is_in_LIR_form()) changed |= propagation.block(bb);
     }
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) bb->trace = nullptr;
     if (changed) simpcfg(false, false);
 }

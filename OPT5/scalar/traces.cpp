@@ -15,6 +15,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/profile.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 
@@ -28,20 +29,16 @@ register_option pass_disable_trace_straighten("disable:trace_straighten");
 unsigned SBLK::next_number = 1;
 
 SBLK::SBLK(BBLK* seed_block)
-    : seed(seed_block), head(seed_block), tail(seed_block), contents{seed_block}, number(next_number++) {
-    seed_block->trace = this;
-}
+    : seed(seed_block), head(seed_block), tail(seed_block), contents{seed_block}, number(next_number++) {}
 
 void SBLK::add_basic_block(BBLK* bb) {
     contents.push_back(bb);
     tail = bb;
-    bb->trace = this;
 }
 
 void SBLK::add_basic_block_in_front(BBLK* bb) {
     contents.insert(contents.begin(), bb);
     head = bb;
-    bb->trace = this;
 }
 
 namespace {
@@ -73,7 +70,10 @@ void SBLK::print(bool full, FILE* out) const {
 
 namespace {
 
-using TRACES = std::vector<std::unique_ptr<SBLK>>;
+struct TRACES {
+    std::vector<std::unique_ptr<SBLK>> list;
+    SIDE_TABLE<SBLK*> around; // by block; null for none yet
+};
 
 BBLK* likeliest(EDGE* edges, bool forward) {
     const EDGE* best = nullptr;
@@ -95,33 +95,33 @@ bool may_be_neighbours(const BBLK* first, const BBLK* second) {
     return !ends_in_promise(first) && !ends_in_promise(second->rdflink);
 }
 
-void grow(SBLK* trace) {
+void grow(TRACES& traces, SBLK* trace) {
     while (BBLK* next = likeliest(trace->tail->successors, true)) {
-        if (next->trace || next == currfuninfo->bb_list || !may_be_neighbours(trace->tail, next)) break;
+        if (traces.around[next] || next == currfuninfo->bb_list || !may_be_neighbours(trace->tail, next)) break;
         trace->add_basic_block(next);
+        traces.around[next] = trace;
     }
     while (trace->head != currfuninfo->bb_list) {
         BBLK* before = likeliest(trace->head->predecessors, false);
-        if (!before || before->trace) break;
+        if (!before || traces.around[before]) break;
         // A block whose likeliest successor is another one belongs to that one's trace.
         if (likeliest(before->successors, true) != trace->head || !may_be_neighbours(before, trace->head)) break;
         trace->add_basic_block_in_front(before);
+        traces.around[before] = trace;
     }
 }
 
 TRACES form_traces() {
     std::vector<BBLK*> seeds;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        bb->trace = nullptr;
-        seeds.push_back(bb);
-    }
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) seeds.push_back(bb);
     std::stable_sort(seeds.begin(), seeds.end(), [](const BBLK* a, const BBLK* b) { return a->dFreqIn > b->dFreqIn; });
     TRACES traces;
     SBLK::next_number = 1;
     for (BBLK* seed : seeds) {
-        if (seed->trace) continue;
-        traces.push_back(std::make_unique<SBLK>(seed));
-        grow(traces.back().get());
+        if (traces.around[seed]) continue;
+        traces.list.push_back(std::make_unique<SBLK>(seed));
+        traces.around[seed] = traces.list.back().get();
+        grow(traces, traces.list.back().get());
     }
     return traces;
 }
@@ -130,13 +130,13 @@ void complain(const char* text) { debug_printf("%s\n", text); }
 
 void validate_traces(const TRACES& traces) {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        if (!bb->trace) complain("Basic block has no trace");
-    for (const auto& trace : traces) {
+        if (!traces.around[bb]) complain("Basic block has no trace");
+    for (const auto& trace : traces.list) {
         if (trace->contents.empty() || trace->contents.front() != trace->head || trace->contents.back() != trace->tail)
             complain("Contents list is out of order");
         for (size_t i = 0; i < trace->contents.size(); ++i) {
             BBLK* bb = trace->contents[i];
-            if (bb->trace != trace.get()) complain("BB belongs to two traces");
+            if (traces.around[bb] != trace.get()) complain("BB belongs to two traces");
             if (std::count(trace->contents.begin(), trace->contents.end(), bb) != 1)
                 complain("BB is not in its trace's contents list");
             if (bb->dFreqIn > trace->seed->dFreqIn) complain("BB in trace has higher frequency than the seed");
@@ -153,12 +153,12 @@ void validate_traces(const TRACES& traces) {
 std::vector<BBLK*> order_of(const TRACES& traces) {
     const BBLK* const entry = currfuninfo->bb_list;
     std::vector<BBLK*> order;
-    for (const auto& trace : traces) {
+    for (const auto& trace : traces.list) {
         if (trace->head != entry && ends_in_promise(trace->head->rdflink)) continue; // comes behind that one
         for (const SBLK* t = trace.get(); t;) {
             order.insert(order.end(), t->contents.begin(), t->contents.end());
             const BBLK* tail = t->tail;
-            t = tail->dflink && ends_in_promise(tail) ? static_cast<const SBLK*>(tail->dflink->trace) : nullptr;
+            t = tail->dflink && ends_in_promise(tail) ? traces.around[tail->dflink] : nullptr;
         }
     }
     return order;
@@ -166,11 +166,12 @@ std::vector<BBLK*> order_of(const TRACES& traces) {
 
 void lay_out(TRACES& traces) {
     BBLK* const entry = currfuninfo->bb_list;
-    const auto first = std::find_if(traces.begin(), traces.end(), [entry](const auto& t) { return t->head == entry; });
-    if (first == traces.end()) return;
-    std::rotate(traces.begin(), first, first + 1);
+    auto& list = traces.list;
+    const auto first = std::find_if(list.begin(), list.end(), [entry](const auto& t) { return t->head == entry; });
+    if (first == list.end()) return;
+    std::rotate(list.begin(), first, first + 1);
     size_t count = 0;
-    for (const auto& trace : traces) count += trace->contents.size();
+    for (const auto& trace : list) count += trace->contents.size();
     const std::vector<BBLK*> order = order_of(traces);
     if (order.size() != count) return;
     BBLK* last = nullptr;
@@ -181,10 +182,6 @@ void lay_out(TRACES& traces) {
     }
     last->dflink = nullptr;
     entry->rdflink = last;
-}
-
-void forget_traces() {
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->trace = nullptr;
 }
 
 } // namespace
@@ -199,10 +196,9 @@ void straighten_traces_in_cfg() {
         validate_traces(traces);
         debug_printf("\n\t\tSUPERBLOCK/TRACE OBJECTS\n\n");
         if (fdebug)
-            for (const auto& trace : traces) trace->print(true, fdebug);
+            for (const auto& trace : traces.list) trace->print(true, fdebug);
     }
     lay_out(traces);
-    forget_traces();
     renumber_bblocks();
 }
 

@@ -65,8 +65,7 @@ I_SYMTAB* OPT_CLIENT::cl_symbol_create(const char* name, TYPE* type, TYPE* secon
     sym->level = lex;
     sym->written_as_parameter = lex == 1;
     if (!file_level) {
-        sym->order_of_reading = next_depnum++;
-        sym->set_depnum(sym->order_of_reading);
+        sym->set_depnum(next_depnum++);
         switch (sclass) {
         case SC_AUTO:
         case SC_EXTDEF:

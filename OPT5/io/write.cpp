@@ -93,7 +93,7 @@ void write_parameters(FUNINFO* f) {
         for (SYMTAB* s = list; s; s = s->next)
             if (s->level == 1 && s->written_as_parameter) parms.push_back(s);
     std::stable_sort(parms.begin(), parms.end(),
-                     [](const SYMTAB* a, const SYMTAB* b) { return a->order_of_reading < b->order_of_reading; });
+                     [](const SYMTAB* a, const SYMTAB* b) { return a->depnum() < b->depnum(); });
     for (SYMTAB* s : parms) write_symbol(s);
 }
 

@@ -2,7 +2,6 @@
 
 #include "OPT5/ir/bblk.h"
 
-#include "BITVEC/bitvec.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
@@ -13,10 +12,6 @@
 
 int internal_label_index = 0;
 std::map<int32_t, LBL*> label_mapping;
-
-BBLK::~BBLK() {
-    for (BITVEC* set : live_sets) delete set;
-}
 
 const char* BBLK::str() const {
     static char buffers[8][32];

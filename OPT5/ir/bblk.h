@@ -16,7 +16,6 @@
 #include <string>
 #include <vector>
 
-class BITVEC;
 class BBLK;
 
 struct EDGE {
@@ -36,8 +35,6 @@ public:
     EDGE* successors = nullptr;
     LBL* label = nullptr; // chained through LBL::next, owned
     struct LOOP* loop = nullptr;
-    // Live in, live out, use, def and three working sets.
-    BITVEC* live_sets[7] = {};
     PSN* first_psn = nullptr;
     PSN* last_psn = nullptr;
     double dFreqIn = -1.0, dFreqOut = -1.0;
@@ -48,7 +45,6 @@ public:
     mutable LIST* control = nullptr; // the cell that `last_statement` found; null: to be found
 
     explicit BBLK(FUNINFO* owner) : serial_object(owner) {}
-    ~BBLK();
     FUNINFO* owner() const { return manager; }
     bool is_in_LIR_form() const { return fn != nullptr; }
     const char* str() const; // "BB<dfn>", with the serial number under debug:dump_serial; rotating static buffers

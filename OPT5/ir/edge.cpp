@@ -2,9 +2,9 @@
 
 #include "OPT5/ir/bblk.h"
 
-#include "BITVEC/bitvec.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/side_table.h"
 #include "OPT5/ir/trees.h"
 
@@ -203,10 +203,9 @@ BBLK* make_block_on_edge(BBLK* a, BBLK* b) {
     a->successors = add_edge(n, a->successors);
     n->predecessors = mkedge(a, nullptr);
     subst_bb_for_bb_in_bb(n, b, a);
-    if (a->owner()->lva_sym_count > 0 && b->live_sets[0]) {
-        n->live_sets[0] = new BITVEC(*b->live_sets[0]);
-        n->live_sets[1] = new BITVEC(*b->live_sets[0]);
-        for (int i : {2, 3}) n->live_sets[i] = new BITVEC(b->live_sets[0]->bits);
+    if (live_at_entry(b)) {
+        const BITVEC live = *live_at_entry(b);
+        a->owner()->live_sets->of[n] = {live, live};
     }
     edges_were_changed(a->owner());
     return n;

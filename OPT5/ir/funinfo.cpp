@@ -6,6 +6,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/loops.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -299,6 +300,7 @@ void erase_all() {
     erase_eht(f);
     f->dominators.reset();
     f->loops.reset();
+    f->live_sets.reset();
     f->facts = fact::none;
     f->spmap->clear();
     f->snmap->clear();

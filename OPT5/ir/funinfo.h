@@ -27,6 +27,7 @@ class NODE;
 class SNMAP;
 class SPMAP;
 struct LBL;
+struct LIVE_SETS;
 
 enum FUN_FLAG : uint64_t {
     FUN_calls_anonymous = 0x1,
@@ -145,6 +146,7 @@ public:
     FACTS facts = fact::none; // those that are true now; asked and changed through OPT5/ir/facts.h
     std::unique_ptr<Dominator> dominators;
     std::unique_ptr<NATURAL_LOOPS> loops;
+    std::unique_ptr<LIVE_SETS> live_sets;
     long temp_counter = 0;
     SYMTAB* ret_by_cctor_sym = nullptr;
     SYMTAB* csu_return_sym = nullptr;

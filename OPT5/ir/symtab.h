@@ -88,8 +88,7 @@ public:
     uint32_t location = 0;
     uint32_t option_set = 0;
     SYMTAB* next = nullptr; // link of whichever symbol list holds it
-    int64_t depnum_m = 0;
-    int64_t order_of_reading = 0; // of a symbol of a function; `depnum` starts as it and then belongs to the analyses
+    int64_t depnum_m = 0; // of a function's symbol: its place in the order of reading, from 0
     uint16_t bitnum_m = 0;
     bool is_aliased_m = false;
     bool is_temp = false;

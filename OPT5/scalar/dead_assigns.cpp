@@ -17,6 +17,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -133,7 +134,7 @@ public:
     void run(BBLK* bb) {
         start_from_successors(bb);
         live -= faint;
-        *bb->live_sets[LIVE_OUT] = live;
+        *live_at_exit(bb) = live;
         std::vector<LIST*> cells;
         for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
         COPY copy, copy_behind; // of the next statement and of the one behind it
@@ -167,7 +168,7 @@ private:
     void start_from_successors(const BBLK* bb) {
         live = BITVEC(static_cast<uint32_t>(currfuninfo->lva_sym_count));
         for (const EDGE* e = bb->successors; e; e = e->rest) {
-            if (const BITVEC* set = e->first->live_sets[LIVE_IN])
+            if (const BITVEC* set = live_at_entry(e->first))
                 live |= *set;
             else
                 live.set_all();
@@ -270,7 +271,6 @@ int elim_dead_assigns(bool keep_embedded, bool early) {
     if (TEST_FLAG(f, FUN_is_cpp)) remove_unneeded_stores_from_destructor();
     need(fact::live_variables);
     if (f->lva_sym_count == 0) return 0;
-    count_lifetimes();
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'elim_dead_assigns' ----------\n");
     ELIMINATION elimination;
     BBLK* const entry = f->bb_list;
@@ -295,7 +295,7 @@ namespace {
 
 class COUNTER_STEPS final : public BACKWARD_WALK {
 public:
-    COUNTER_STEPS(BBLK* bb, const struct LOOP* loop) : live(*bb->live_sets[LIVE_OUT]), is_counter(live.bits) {
+    COUNTER_STEPS(BBLK* bb, const struct LOOP* loop) : live(*live_at_exit(bb)), is_counter(live.bits) {
         for (LIST* s = bb->statements; s; s = s->rest)
             for_each_node(s->first, [&](const NODE* t) {
                 const int bit = t->op == NAME ? live_index(t->u.sym) : -1;
@@ -318,7 +318,7 @@ private:
 } // namespace
 
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop) {
-    if (!loop || !is_loop_counter || !bb->live_sets[LIVE_OUT]) return;
+    if (!loop || !is_loop_counter || !live_at_exit(bb)) return;
     COUNTER_STEPS(bb, loop).block(bb);
     drop_empty_cells(&bb->statements);
 }

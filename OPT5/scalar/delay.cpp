@@ -7,11 +7,11 @@
 
 #include "OPT5/scalar/delay.h"
 
-#include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/eda.h"
@@ -80,7 +80,7 @@ private:
         if (!currfuninfo->stack_is_laid_out && reads_memory(t->right)) return nullptr;
         BBLK* target = nullptr;
         for (const EDGE* e = bb->successors; e; e = e->rest) {
-            const BITVEC* in = e->first->live_sets[LIVE_IN];
+            const BITVEC* in = live_at_entry(e->first);
             if (!in) return nullptr;
             if (!in->test(static_cast<uint32_t>(bit))) continue;
             if (target) return nullptr;
@@ -103,7 +103,7 @@ private:
         insert_before(&target->statements, assignment, cell->psn);
         cell->first = nullptr;
         drop_statement(before ? &before->rest : &bb->statements);
-        BITVEC& in = *target->live_sets[LIVE_IN];
+        BITVEC& in = *live_at_entry(target);
         in.clear(static_cast<uint32_t>(live_index(assignment->left->u.sym)));
         for_each_node(assignment->right, [&in](const NODE* t) {
             if (t->op != NAME) return;

@@ -12,17 +12,12 @@ class SYMTAB;
 struct LIST;
 
 // ---- Live variables
-// What each set of a block is. They exist while `fact::live_variables` is known, with `FUNINFO::lva_sym_count` bits.
-enum LIVE_SET { LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF };
 constexpr int NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
 
-// Gives every local scalar that only its own NAME can reach a bit, `bitnum`, and computes the sets of all blocks.
-// `with_lifetimes` also counts the blocks that each is live in, in `depnum`. `mode` says who asks, for the debug
-// stream.
-void find_live_variables(int mode, bool with_lifetimes);
+// Gives every local scalar that only its own NAME can reach a bit, `bitnum`, and finds the sets of all blocks: what
+// `need(fact::live_variables)` does where they are not known.
+void find_live_variables();
 void lva_cleanup();
-// The blocks that each candidate is live in, in `depnum`, by the sets as they are.
-void count_lifetimes();
 // The bit of a symbol that is a candidate, or -1.
 int live_index(const SYMTAB* sym);
 

@@ -4,6 +4,7 @@
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/eda.h"
@@ -251,7 +252,7 @@ bool LOOP_FACTS::is_used_after(const SYMTAB* sym) const {
     if (bit < 0) return true;
     for (const BBLK* bb : loop->blocks)
         for (const EDGE* e = bb->successors; e; e = e->rest)
-            if (!loops.contains(loop, e->first) && e->first->live_sets[LIVE_IN]->test(static_cast<uint32_t>(bit)))
+            if (!loops.contains(loop, e->first) && live_at_entry(e->first)->test(static_cast<uint32_t>(bit)))
                 return true;
     return false;
 }

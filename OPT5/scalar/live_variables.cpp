@@ -16,6 +16,7 @@
 #include "OPT5/ir/dataflow.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/seq.h"
@@ -83,42 +84,25 @@ private:
     BITVEC *use, *def;
 };
 
-void compute_use_and_def(BBLK* bb, uint32_t bits) {
-    for (int i : {LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF}) {
-        delete bb->live_sets[i];
-        bb->live_sets[i] = new BITVEC(bits);
-    }
-    USE_DEF_WALK(bb->live_sets[LIVE_USE], bb->live_sets[LIVE_DEF]).block(bb);
-}
+struct USE_DEF {
+    BITVEC use, def;
+};
 
 void solve(uint32_t bits) {
-    const DATAFLOW live(FLOW::BACKWARD, MEET::UNION, BITVEC(bits), [](const BBLK* bb, BITVEC& set) {
-        set -= *bb->live_sets[LIVE_DEF];
-        set |= *bb->live_sets[LIVE_USE];
+    SIDE_TABLE<USE_DEF> sets({BITVEC(bits), BITVEC(bits)});
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) USE_DEF_WALK(&sets[bb].use, &sets[bb].def).block(bb);
+    const DATAFLOW live(FLOW::BACKWARD, MEET::UNION, BITVEC(bits), [&](const BBLK* bb, BITVEC& set) {
+        set -= sets[bb].def;
+        set |= sets[bb].use;
     });
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        *bb->live_sets[LIVE_IN] = live.at_entry(bb);
-        *bb->live_sets[LIVE_OUT] = live.at_exit(bb);
-    }
+    currfuninfo->live_sets = std::make_unique<LIVE_SETS>();
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        currfuninfo->live_sets->of[bb] = {live.at_entry(bb), live.at_exit(bb)};
 }
 
 } // namespace
 
-void count_lifetimes() {
-    FUNINFO* f = currfuninfo;
-    std::vector<int64_t> blocks(static_cast<size_t>(f->lva_sym_count), 0);
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
-        BITVEC live = *bb->live_sets[LIVE_IN];
-        live |= *bb->live_sets[LIVE_OUT];
-        for (uint32_t i = live.next_set(0); i < live.bits; i = live.next_set(i + 1)) ++blocks[i];
-    }
-    for (SYMTAB* list : {f->scalar_syms, f->memory_syms})
-        for (SYMTAB* sym = list; sym; sym = sym->next)
-            if (int n = live_index(sym); n >= 0) sym->set_depnum(blocks[static_cast<size_t>(n)]);
-}
-
-void find_live_variables(int mode, bool with_lifetimes) {
-    (void)mode;
+void find_live_variables() {
     FUNINFO* f = currfuninfo;
     if (!f || !f->bb_list) return;
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'find_live_variables' --------\n");
@@ -127,26 +111,15 @@ void find_live_variables(int mode, bool with_lifetimes) {
     need(fact::alias_marks);
     number_candidates();
     if (f->lva_sym_count == 0) return;
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) compute_use_and_def(bb, static_cast<uint32_t>(f->lva_sym_count));
     solve(static_cast<uint32_t>(f->lva_sym_count));
-    if (with_lifetimes) count_lifetimes();
 }
 
 void lva_cleanup() {
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (int i : {LIVE_IN, LIVE_OUT, LIVE_USE, LIVE_DEF}) {
-            if (!bb->live_sets[i]) continue;
-            if (bb->live_sets[i]->shared) {
-                bv_warn("Should not free a zoned bitvector");
-                continue;
-            }
-            delete bb->live_sets[i];
-            bb->live_sets[i] = nullptr;
-        }
+    currfuninfo->live_sets.reset();
     currfuninfo->lva_sym_count = 0;
 }
 
 namespace {
 const FACT_FINDER live_variables("live variables", fact::live_variables, fact::alias_marks,
-                                 [](FACTS) { find_live_variables(0, false); }, lva_cleanup);
+                                 [](FACTS) { find_live_variables(); }, lva_cleanup);
 } // namespace

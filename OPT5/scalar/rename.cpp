@@ -13,11 +13,11 @@
 // seen behind it.
 #include "OPT5/scalar/merge.h"
 
-#include "BITVEC/bitvec.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/eda.h"
@@ -167,7 +167,7 @@ private:
                 const BBLK* from = work.back();
                 work.pop_back();
                 for (BBLK* bb : frontier[index(from)]) {
-                    if (placed[index(bb)] == static_cast<int>(v) || !bb->live_sets[LIVE_IN]->test(bit)) continue;
+                    if (placed[index(bb)] == static_cast<int>(v) || !live_at_entry(bb)->test(bit)) continue;
                     placed[index(bb)] = static_cast<int>(v);
                     joins[index(bb)].push_back({static_cast<int>(v), new_value()});
                     work.push_back(bb);

@@ -51,7 +51,7 @@ std::vector<PARAMETER> parameters() {
         if (s->level == 1 && s->written_as_parameter) list.push_back({s, map_parm_to_sym(s)});
     });
     std::sort(list.begin(), list.end(), [](const PARAMETER& a, const PARAMETER& b) {
-        return a.parm->order_of_reading < b.parm->order_of_reading;
+        return a.parm->depnum() < b.parm->depnum();
     });
     return list;
 }

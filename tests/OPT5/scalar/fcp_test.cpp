@@ -179,7 +179,7 @@ TEST_F(FcpTest, CountersLoseTheStepsThatNoOneReads) {
     build();
     auto* loop = reinterpret_cast<struct LOOP*>(i);
     is_loop_counter = [](const SYMTAB* sym, const struct LOOP* l) { return reinterpret_cast<const SYMTAB*>(l) == sym; };
-    find_live_variables(0, false);
+    find_live_variables();
     elim_locally_dead_assignments_in_bb(currfuninfo->bb_list, loop);
     lva_cleanup();
     is_loop_counter = nullptr;

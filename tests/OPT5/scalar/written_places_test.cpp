@@ -238,7 +238,7 @@ TEST(WrittenPlaces, SingleUses) {
         w.ret(w.y);
         w.build();
         w.put_write();
-        find_live_variables(0, false);
+        find_live_variables();
         eliminate_single_use_temps();
         lva_cleanup();
         return !sym_appears_in_tree(w.x, w.assigned_to(w.y));
@@ -273,7 +273,7 @@ TEST(WrittenPlaces, Inductions) {
         w.put_write(w.name(writes_counter ? w.y : w.x));
         renumber_bblocks();
         NATURAL_LOOPS loops;
-        find_live_variables(0, false);
+        find_live_variables();
         LOOP_FACTS facts(loops, loops.inner_first().front().get());
         const bool is_induction = facts.is_usable() && facts.induction(w.y);
         const bool is_invariant = facts.is_usable() && facts.is_invariant(w.keep(w.name(writes_counter ? w.y : w.x)));

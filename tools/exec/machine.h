@@ -136,7 +136,7 @@ struct EXEC_EXIT {
 
 struct NODE_COUNTS {
     uint64_t by_op[164] = {};
-    uint64_t loads = 0, stores = 0, branches = 0, calls = 0, multiplies = 0;
+    uint64_t loads = 0, stores = 0, branches = 0, tests = 0, calls = 0, multiplies = 0; // tests: branches with a condition
 };
 
 constexpr uint64_t null_page = 16;              // units at address 0 that nothing lives in

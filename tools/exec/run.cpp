@@ -46,6 +46,7 @@ void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
             break;
         case S_CBRANCH:
             m.counts.branches++;
+            m.counts.tests++;
             at = run(s.tree, m) ? at + 1 : s.target;
             break;
         case S_SWITCH:

@@ -100,7 +100,7 @@ private:
     std::unordered_map<const IC_SYMBOL*, PLACE> locals;
     std::unordered_map<uint32_t, int64_t> registers; // VREG number to its offset in the frame
     std::vector<uint16_t>* folded = nullptr;         // operators that became part of the node in work
-    unsigned loads = 0, stores = 0;                  // of that node
+    unsigned loads = 0, stores = 0, fields = 0;      // accesses of that node; `fields` of them to bit-fields
     uint32_t cost = 0;
     size_t depth = 0, deepest = 0;
     std::vector<std::pair<uint32_t, const IC_NODE*>> jumps; // statement, label

@@ -40,6 +40,7 @@ int64_t count(const XNODE* x, MACHINE& m) {
     for (uint16_t opcode : *static_cast<const std::vector<uint16_t>*>(x->extra)) c.by_op[opcode]++;
     c.loads += x->m;
     c.stores += x->n;
+    c.fields += static_cast<uint64_t>(x->k);
     return run(x->a, m);
 }
 
@@ -86,14 +87,15 @@ const XNODE* COMPILER::value(const IC_NODE* n) {
     if (++depth > deepest) deepest = depth;
     std::vector<uint16_t> ops{static_cast<uint16_t>(n->op)};
     std::vector<uint16_t>* outer = folded;
-    const unsigned outer_loads = loads, outer_stores = stores;
+    const unsigned outer_loads = loads, outer_stores = stores, outer_fields = fields;
     folded = &ops;
-    loads = stores = 0;
+    loads = stores = fields = 0;
     const XNODE* x = build(n);
     if (p.options.stats) x = counting(x, ops);
     folded = outer;
     loads = outer_loads;
     stores = outer_stores;
+    fields = outer_fields;
     depth--;
     return x;
 }
@@ -104,6 +106,7 @@ const XNODE* COMPILER::counting(const XNODE* x, const std::vector<uint16_t>& ops
     counter->extra = &p.counted.back();
     counter->m = loads;
     counter->n = stores;
+    counter->k = fields;
     return counter;
 }
 

@@ -202,6 +202,7 @@ XNODE* COMPILER::access(EVAL (*pick)(REP, BASE), const LVALUE& lv, const XNODE* 
 }
 
 XNODE* COMPILER::field_access(EVAL (*pick)(BASE), const LVALUE& lv, const XNODE* b) {
+    fields++;
     XNODE* x = p.node(pick(lv.base), lv.address, b, lv.k);
     x->m = lv.bit;
     x->n = lv.width;

@@ -136,7 +136,9 @@ struct EXEC_EXIT {
 
 struct NODE_COUNTS {
     uint64_t by_op[164] = {};
-    uint64_t loads = 0, stores = 0, branches = 0, tests = 0, calls = 0, multiplies = 0; // tests: branches with a condition
+    uint64_t loads = 0, stores = 0, calls = 0, multiplies = 0;
+    uint64_t branches = 0, tests = 0; // `tests` of them have a condition
+    uint64_t fields = 0;              // loads and stores of bit-fields
 };
 
 constexpr uint64_t null_page = 16;              // units at address 0 that nothing lives in

@@ -87,9 +87,14 @@ namespace {
 // Its block is the function's, so that there is one life of it; an inner block begins anew at each iteration of a loop.
 bool lives_once(const PTR* p) { return p->scope->depth <= 2 && p->scope->function == currfuninfo; }
 
-// The record of an lvalue's pointer if that is `restrict` and keeps the value that it was declared with.
+// The record of the `restrict` pointer that an lvalue's pointer is, or that all values of it are derived from; it keeps
+// the value that it was declared with. What is derived from it may hold a value of an earlier life. Null without one.
 const PTR* restricted_record(const NODE* lvalue, bool at_any_time) {
     const PTR* p = record_of(lvalue);
+    if (p && !(p->flags & PTR_IS_RESTRICTED)) {
+        p = p->root;
+        at_any_time = true;
+    }
     if (!p || !(p->flags & PTR_IS_RESTRICTED) || p->member) return nullptr;
     if (p->flags & (PTR_IS_REASSIGNED | PTR_IS_FILE_LEVEL | PTR_IS_BOTTOM)) return nullptr;
     if (!p->scope || may_be_reached_by_pointers(p->symbol)) return nullptr;

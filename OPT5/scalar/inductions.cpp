@@ -207,8 +207,7 @@ bool LOOP_FACTS::is_invariant(const NODE* t) {
     case ICON: return true;
     case NAME: {
         const SYMTAB* sym = t->u.sym;
-        if (!sym || !t->type->is_scalar() || lvalue_is_volatile(t) || (sym->type->qual_kind(false) & QUAL_RESTRICT))
-            return false;
+        if (!sym || !t->type->is_scalar() || lvalue_is_volatile(t)) return false;
         if (!t->type->is_pointer() && (!t->type->is_int() || t->type->size > ADDRESS_BITS)) return false;
         if (is_private_scalar(sym)) return !assignments.count(sym);
         return is_unchanged(sym, t);

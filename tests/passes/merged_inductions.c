@@ -194,6 +194,13 @@ long changing_steps(int n) {
     return r + asked;
 }
 
+// FUNCTION: kept_apart
+// COUNT 0: x + i
+// COUNT 0: y + i
+void kept_apart(const int *restrict x, int *restrict y, int n) {
+    for (int i = 0; i < n; i++) y[i] = x[i] * x[i + 1];
+}
+
 int main(void) {
     for (int i = 0; i < 300; i++) a[i] = i ^ 5, b[i] = 300 - i;
     for (int i = 0; i < 64; i++) w[i] = i * 7L, next[i] = i % 3 + 1, m[i / 8][i % 8] = i;
@@ -212,5 +219,7 @@ int main(void) {
     put_i16(found(203));
     put_i32(wraps(3, w, 1) + bounded(9) + kept_volatile(9) + kept_aliased(9) + promised(4));
     put_i32(changing_steps(60) + tested_late(-1UL, 5) * 7 + tested_late(9, 5));
+    kept_apart(a, b, 30);
+    put_i16(b[29] + b[3]);
     return 0;
 }

@@ -5,22 +5,27 @@
 //
 // with C an access of the container, k the field's place in it and m as many ones as it is wide. The container is the
 // 16-bit unit that the field lies in. A field that crosses units, and a volatile one, is accessed as its declared type.
-// A local structure that is accessed by its fields alone becomes a variable for each of them. A small one that is
-// copied as a whole, too, and a union, becomes one integer variable, in which the fields lie as they did.
+// A local structure that is accessed by its members alone becomes a variable for each of them; one that is copied as a
+// whole, too, where that costs less than the accesses gain. Another small one, and a union, becomes one integer variable,
+// in which the fields lie as they did.
 //
-// Needs: nothing. Leaves: what rests on the graph; symbols are split anew where there are new ones.
+// Needs: loops and alias marks. Leaves: what rests on the graph; symbols are split anew where there are new ones.
 // Sound because a container holds nothing but fields. Where it would reach past the structure, or hold another member,
 // to which the store would write back an old value, the access stays as it is; and so does a field across units on a
 // target whose numbers start with the high unit. What is evaluated once stays so: an address or a value with side
 // effects is kept in a variable ahead of the store.
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/scalar/lowering.h"
+#include "OPT5/scalar/structure_copy.h"
+#include "OPT5/simp/range.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
 
@@ -31,6 +36,9 @@
 namespace {
 
 constexpr int UNIT = 16, MOST_MAPPED_BITS = 32, MOST_VARIABLES = 16;
+// What an access of a member gains where that is a variable, and what a copy of the structure loses by each member.
+constexpr double ACCESS_GAIN = 4, COPY_LOSS = 6;
+constexpr double ITERATIONS = 8; // of a loop, as an estimate
 
 bool is_field(const NODE* t) {
     return (t->op == STDOT || t->op == STREF) && t->right && t->right->op == FIELD && t->right->mval &&
@@ -39,6 +47,7 @@ bool is_field(const NODE* t) {
 
 TYPE* unsigned_of(int bits) { return bits == 16 ? tp->uint_t : bits == 32 ? tp->ulong_t : tp->ullong_t; }
 TYPE* signed_of(int bits) { return bits == 16 ? tp->int_t : bits == 32 ? tp->long_t : tp->llong_t; }
+bool is_plain_scalar(TYPE* t) { return t->is_scalar() && !t->is_complex(); }
 bool has_sign(TYPE* t) { return int_type_min(normalized_value_type(t)->stqs()).is_negative(); }
 
 INT65 ones(int width) { return width >= 64 ? ~INT65(0) : (INT65(1) << INT65(width)) - INT65(1); }
@@ -116,6 +125,8 @@ bool is_place(const NODE* t) {
 // What a local structure becomes: a variable for each member by its ordinal, or one for all.
 struct MAPPING {
     bool is_copied = false;
+    bool fits_integer = true, is_steady = true; // each copy
+    double gain = 0, copies = 0;
     SYMTAB* whole = nullptr;
     std::vector<SYMTAB*> parts;
 };
@@ -129,9 +140,11 @@ private:
     void map_symbols();
     bool map_symbol(SYMTAB* sym, MAPPING* mapping);
     void look_at_copy(const NODE* copy);
-    void drop_what_is_named_otherwise(const NODE* t);
+    void look_at(const NODE* t);
     MAPPING* mapping_of(const NODE* t);
+    MAPPING* parts_behind(const NODE* t);
     NODE* expand_copy(NODE* t);
+    NODE* expand_copy_by_members(NODE* t);
 
     bool find_place(NODE* field, PLACE* place);
     NODE* read_of(const PLACE& place);
@@ -145,6 +158,7 @@ private:
     std::unordered_map<const SYMTAB*, MAPPING> mappings;
     std::vector<SYMTAB*> candidates;
     std::vector<SYMTAB*> wholes;
+    double frequency = 1; // of the block in work
     bool found = false;
 };
 
@@ -166,56 +180,91 @@ MAPPING* EXPANSION::mapping_of(const NODE* t) {
     return at == mappings.end() ? nullptr : &at->second;
 }
 
-void EXPANSION::drop_what_is_named_otherwise(const NODE* t) {
+// A scalar member of a candidate.
+bool is_scalar_member(const NODE* t) {
+    return t->op == STDOT && t->left->op == NAME && t->right && t->right->op == FIELD && t->right->mval &&
+           (t->right->mval->is_bitfld || is_plain_scalar(t->right->mval->type)) &&
+           t->type->size == normalized_value_type(t->right->mval->type)->size;
+}
+
+// A candidate that is named in any other way than by a member is none.
+void EXPANSION::look_at(const NODE* t) {
     for (; t; t = t->left) {
-        if (is_field(t) && t->op == STDOT && t->left->op == NAME) return;
-        if (t->op == NAME) {
-            mappings.erase(t->u.sym);
+        if (is_scalar_member(t)) {
+            if (MAPPING* mapping = mapping_of(t->left)) mapping->gain += ACCESS_GAIN * frequency;
             return;
         }
-        drop_what_is_named_otherwise(t->right);
+        const NODE* named = t->op == UAND || t->op == ARGREF ? name_of_place(static_cast<const NODE*>(t->left)) : t;
+        if (named && named->op == NAME) mappings.erase(named->u.sym);
+        look_at(t->right);
     }
 }
 
-// A copy of a structure that an integer can stand for.
 void EXPANSION::look_at_copy(const NODE* copy) {
     TYPE* type = copy->left->type;
-    const bool fits = type->size == 16 || (type->size == 32 && type->align >= 32);
+    const bool is_copy = is_place(copy->left) && is_place(copy->right) && type->real == copy->right->type->real;
     for (const NODE* side : {copy->left, copy->right}) {
-        MAPPING* mapping = fits && is_place(copy->left) && is_place(copy->right) ? mapping_of(side) : nullptr;
-        if (mapping)
-            mapping->is_copied = true;
-        else
-            drop_what_is_named_otherwise(side);
+        MAPPING* mapping = is_copy ? mapping_of(side) : nullptr;
+        if (!mapping) {
+            look_at(side);
+            continue;
+        }
+        mapping->is_copied = true;
+        mapping->fits_integer &= type->size == 16 || (type->size == 32 && type->align >= 32);
+        mapping->copies += frequency;
+        mapping->is_steady &= is_steady_place(copy->left) && is_steady_place(copy->right);
     }
+}
+
+// Whether each member can have a variable; how many they are.
+bool members_are_scalar(const TYPE* type, int* count) {
+    *count = 0;
+    bool all = true;
+    for (const fkMDATA* m = type->real->mdata(); m; m = m->next, ++*count)
+        all &= m->is_bitfld || is_plain_scalar(m->type);
+    return all;
 }
 
 bool EXPANSION::map_symbol(SYMTAB* sym, MAPPING* mapping) {
-    int members = 0;
-    for (const fkMDATA* m = sym->type->real->mdata(); m; m = m->next) ++members;
-    if (!sym->type->is_union() && !mapping->is_copied && members <= MOST_VARIABLES) {
+    int members;
+    const bool all_scalar = members_are_scalar(sym->type, &members);
+    const bool pays = !mapping->is_copied || (all_scalar && mapping->is_steady &&
+                                              mapping->gain > COPY_LOSS * members * mapping->copies);
+    if (!sym->type->is_union() && pays && members <= MOST_VARIABLES) {
         for (const fkMDATA* m = sym->type->real->mdata(); m; m = m->next)
-            mapping->parts.push_back(
-                m->is_bitfld ? sym_temp('B', -1, normalized_value_type(m->type)->stqs(), sym->scope) : nullptr);
+            mapping->parts.push_back(m->is_bitfld || is_plain_scalar(m->type)
+                                         ? sym_temp('B', -1, normalized_value_type(m->type)->stqs(), sym->scope)
+                                         : nullptr);
         return true;
     }
     const auto size = static_cast<int>(sym->type->size);
-    if (size > MOST_MAPPED_BITS || (memory_is_big_endian && size > UNIT)) return false;
+    if (!mapping->fits_integer || size > MOST_MAPPED_BITS || (memory_is_big_endian && size > UNIT)) return false;
+    for (const fkMDATA* m = sym->type->real->mdata(); m; m = m->next)
+        if (!m->is_bitfld) return false;
     if (print_debug) debug_printf("\n  CSU symbol mapped to integer type: %s", sym->name);
     mapping->whole = sym_temp('B', -1, unsigned_of(size), sym->scope);
     wholes.push_back(mapping->whole);
     return true;
 }
 
+double frequency_of(const BBLK* bb) {
+    double f = 1;
+    for (const NATURAL_LOOP* loop = currfuninfo->loops->around(bb); loop; loop = loop->parent) f *= ITERATIONS;
+    return f;
+}
+
 void EXPANSION::map_symbols() {
     list_candidates();
     if (candidates.empty()) return;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+    need(fact::loops | fact::alias_marks);
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        frequency = frequency_of(bb);
         for (LIST* s = bb->statements; s; s = s->rest)
             if (s->first->op == STASG && !tree_is_arg_prolog(s->first))
                 look_at_copy(s->first);
             else
-                drop_what_is_named_otherwise(s->first);
+                look_at(s->first);
+    }
     for (SYMTAB* s : candidates) {
         auto at = mappings.find(s);
         if (at == mappings.end()) continue;
@@ -228,10 +277,27 @@ void EXPANSION::map_symbols() {
     }
 }
 
-// Copies from and to an integer that stands for a structure.
+// The variables that stand for the structure itself; null for anything else.
+MAPPING* EXPANSION::parts_behind(const NODE* t) {
+    MAPPING* mapping = mapping_of(t);
+    return mapping && !mapping->whole ? mapping : nullptr;
+}
+
+NODE* EXPANSION::expand_copy_by_members(NODE* t) {
+    std::vector<NODE*> copies;
+    copy_by_members(t->left, t->right, &copies);
+    erase_tree(t);
+    NODE* all = nullptr;
+    for (NODE* copy : copies) all = mk_COMMAOP(all, copy);
+    found = true;
+    return all;
+}
+
+// Copies from and to what stands for a structure.
 NODE* EXPANSION::expand_copy(NODE* t) {
     MAPPING *to = mapping_of(t->left), *from = mapping_of(t->right);
     if (!to && !from) return t;
+    if (parts_behind(t->left) || parts_behind(t->right)) return expand_copy_by_members(t);
     TYPE* type = unsigned_of(static_cast<int>(t->left->type->size));
     auto as_integer = [type](NODE* side, const MAPPING* mapping) {
         LS* ls = side->ls;
@@ -297,8 +363,18 @@ NODE* EXPANSION::read_of(const PLACE& place) {
     return convert(place.type, place.at + place.width == place.bits ? c : masked(c, ones(place.width)));
 }
 
+// Whether a field holds every value that the tree can have.
+bool fits_field(const PLACE& place, const NODE* value) {
+    if (!has_value_range(value->type)) return false;
+    const RANGE range = range_of_tree(value, nullptr);
+    const bool is_signed = has_sign(place.type);
+    const WIDE end = WIDE(1) << (is_signed ? place.width - 1 : place.width);
+    return range.max < end && range.min >= (is_signed ? -end : 0);
+}
+
 // The value that a field has once `value` is stored to it.
 NODE* EXPANSION::extended(const PLACE& place, NODE* value) {
+    if (fits_field(place, value)) return value;
     PLACE alone = place;
     alone.container = convert(unsigned_of(place.bits), value);
     alone.content = nullptr;
@@ -392,7 +468,14 @@ NODE* EXPANSION::expand(NODE* t, bool value_is_used) {
     }
     t->left = expand(t->left, t->op != COMMAOP && t->op != PCOMMA);
     t->right = expand(t->right, t->op == COMMAOP ? value_is_used : t->op != PCOMMA);
-    if (!is_field(t)) return t;
+    if (!is_field(t)) {
+        MAPPING* mapping = is_scalar_member(t) ? mapping_of(t->left) : nullptr;
+        if (!mapping) return t;
+        NODE* variable = mk_NAME(mapping->parts[t->right->mval->ordinal - 1], t->ls);
+        erase_tree(t);
+        found = true;
+        return variable;
+    }
     PLACE place;
     if (!find_place(t, &place)) return t;
     found = true;

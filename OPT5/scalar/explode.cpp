@@ -18,6 +18,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/lowering.h"
+#include "OPT5/scalar/structure_copy.h"
 #include "OPT5/simp/simp.h"
 
 #include <unordered_map>
@@ -70,51 +71,6 @@ struct CANDIDATE {
         return nullptr;
     }
 };
-
-NODE* member_of(const NODE* object, fkMDATA* m) {
-    NODE* field = new_node(FIELD, m->type);
-    field->mk_field(1, m, object->type);
-    NODE* t = maketree(STDOT, copy_tree(object), field, normalized_value_type(m->type), object->ls);
-    t->type = merge_qualifiers_for_STDOT(t->type, t);
-    return t;
-}
-
-// A copy of a structure as copies of its scalars, in order. `to` and `from` are borrowed.
-void copy_by_members(const NODE* to, const NODE* from, std::vector<NODE*>* copies) {
-    for (fkMDATA* m = to->type->real->mdata(); m; m = m->next) {
-        NODE *target = member_of(to, m), *value = member_of(from, m);
-        if (m->type->is_csu()) {
-            copy_by_members(target, value, copies);
-            erase_tree(target);
-            erase_tree(value);
-        } else
-            copies->push_back(mk_ASG(target, value));
-    }
-}
-
-// Whether a pointer has the same value whatever is stored through it: no memory is read for it.
-bool is_steady_pointer(const NODE* t) {
-    switch (t->op) {
-    case ICON: return true;
-    case NAME: return is_private_name(t);
-    case PLUS:
-    case MINUS: return is_steady_pointer(t->left) && is_steady_pointer(t->right);
-    case MULT:
-    case SLL: return is_steady_pointer(t->left) && t->right->op == ICON;
-    case SCONV:
-    case PCONV: return is_steady_pointer(t->left);
-    case UAND: return t->left->op == NAME;
-    default: return false;
-    }
-}
-
-bool is_steady_place(const NODE* t) {
-    if (type_may_contain_volatile(t->type) || lvalue_is_volatile(t)) return false;
-    for (; t->op == STDOT; t = t->left) {
-    }
-    if (t->op == NAME) return true;
-    return (t->op == UMULT || t->op == STREF) && (t->op == STREF || !t->right) && is_steady_pointer(t->left);
-}
 
 class EXPLOSION {
 public:

@@ -109,6 +109,39 @@ int copied(struct wide *p, int n) {
     return h.y + (int)p->y;
 }
 
+// A loop's work on the members is worth taking two copies apart; a single access is not.
+struct mode {
+    unsigned a : 3;
+    int b : 5;
+    long sum;
+    unsigned long c : 20;
+} modes[2];
+
+// FUNCTION: worked
+// COUNT 0: class 1,
+// COUNT 0: /\*[^=]*[-+|&]= /
+// HAS: $O$B0 = (unsigned int)((int)$O$B0 + 3) & 7
+long worked(struct mode *p, int n) {
+    struct mode m = *p;
+    for (int i = 0; i < n; i++) {
+        m.a += 3;
+        m.b -= m.a;
+        m.sum += m.b;
+        m.c = m.c * 5 + m.a;
+    }
+    *p = m;
+    return m.sum + m.c;
+}
+
+// FUNCTION: looked_at
+// COUNT 2: =struct
+int looked_at(struct mode *p, struct mode *q) {
+    struct mode m = *p;
+    m.a++;
+    *q = m;
+    return m.b;
+}
+
 int main(void) {
     struct flags t[2] = {{0, 1, 2, 3, 4}, {1, 3, 8191, -256, -64}};
     for (int i = -3; i < 12; i += 2) {
@@ -121,6 +154,8 @@ int main(void) {
         put_i16(overlaid(i * 50));
         put_i16(copied(&w, i));
         put_i16(reads(&s));
+        put_i32(worked(modes, i) + looked_at(modes, modes + 1));
+        put_i32(modes[1].a + modes[1].b + (long)modes[1].c * 3 - modes[0].a);
     }
     return 0;
 }

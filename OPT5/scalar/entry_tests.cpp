@@ -1,7 +1,7 @@
 // The first test of a loop, decided by what its counters start from.
 //
 //     i = 0; goto test; body: ... test: if (i < 24) goto body;     loses the jump: the loop is entered at its body
-//     i = 0; if (i >= 24) goto behind; body: ...                   loses the test
+//     i = 0; if (i >= 24) goto behind; body: ...                   loses the test, in a block of its own or not
 //
 // Earlier in the pipeline this would leave loops with two entries, or a body behind no test at all; here only the
 // layout is left to do.
@@ -32,12 +32,11 @@ namespace {
 constexpr int MAX_TEST_NODES = 12, MAX_VALUE_NODES = 8;
 constexpr size_t MAX_TAIL = 12; // statements looked at for constants
 
-// The IF that is all of a block, or null.
-NODE* lone_test(const BBLK* bb) {
-    const LIST* only = bb->statements;
-    if (!only || only->rest || only->first->op != IF || bb->is_in_LIR_form()) return nullptr;
-    NODE* test = only->first;
-    if (test->left->op == ENDLOOP || tree_has_side_effects(test->left)) return nullptr;
+// The IF at the end of a block, if it is a test that can be asked; null otherwise.
+NODE* test_of(const BBLK* bb) {
+    if (bb->is_in_LIR_form()) return nullptr;
+    NODE* test = bb->branch();
+    if (!test || test->op != IF || test->left->op == ENDLOOP || tree_has_side_effects(test->left)) return nullptr;
     return count_nodes_in_tree(test->left) <= MAX_TEST_NODES ? test : nullptr;
 }
 
@@ -45,8 +44,10 @@ class ENTRY_TESTS {
 public:
     bool run() {
         bool changed = false;
-        for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
-            if (NODE* test = lone_test(bb)) changed |= skip(bb, test);
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            NODE* test = test_of(bb);
+            if (test) changed |= bb->statements->rest ? decide_at_end(bb, test) : skip(bb, test);
+        }
         return changed;
     }
 
@@ -58,7 +59,7 @@ private:
                 from.push_back(e->first);
         bool changed = false;
         for (BBLK* before : from) {
-            BBLK* target = decided_target(before, test);
+            BBLK* target = decided_target(statements_of(before), test);
             if (!target || target == bb) continue;
             if (ends_in_promise(before) && target != before->dflink) continue;
             const bool is_only_way = !bb->predecessors->rest;
@@ -70,10 +71,21 @@ private:
         return changed;
     }
 
-    // Where the test leads behind what `before` assigns last; null if that is not known.
-    BBLK* decided_target(const BBLK* before, const NODE* test) {
-        std::vector<const NODE*> tail;
-        for (const LIST* s = before->statements; s; s = s->rest) tail.push_back(s->first);
+    bool decide_at_end(BBLK* bb, const NODE* test) {
+        std::vector<const NODE*> ahead = statements_of(bb);
+        ahead.pop_back();
+        BBLK* target = decided_target(ahead, test);
+        return target && !(ends_in_promise(bb) && target != bb->dflink) && decide(bb, target);
+    }
+
+    static std::vector<const NODE*> statements_of(const BBLK* bb) {
+        std::vector<const NODE*> list;
+        for (const LIST* s = bb->statements; s; s = s->rest) list.push_back(s->first);
+        return list;
+    }
+
+    // Where the test leads behind what the statements assign last; null if that is not known.
+    BBLK* decided_target(const std::vector<const NODE*>& tail, const NODE* test) {
         NODE* condition = copy_tree(test->left);
         for (size_t n = 0; n < tail.size() && n < MAX_TAIL && condition->op != ICON; ++n) {
             const NODE* t = tail[tail.size() - 1 - n];

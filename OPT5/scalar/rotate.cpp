@@ -1,8 +1,8 @@
 // Layout of loops, ahead of the output: one conditional branch closes a loop.
 //
 // Needs: block numbers, which are layout positions here. Leaves: them.
-// Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does not
-// fall into its successor. Only a pragma that promises something of the loop behind it in the text depends on the
+// Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does
+// not fall into its successor. Only a pragma that promises something of the loop behind it in the text depends on the
 // layout, so no block moves in between.
 
 #include "OPT5/scalar/simpcfg.h"
@@ -10,6 +10,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 
@@ -38,8 +39,8 @@ bool holds_LOOP(const BBLK* bb) {
 //     D .. E     the body; E jumps back to B
 //     F          what follows, if anything
 //
-// becomes A, D .. E, B .. C, F: A jumps to B once, and C closes the loop with its conditional branch back to D. A block's
-// dfn is its place in the layout.
+// becomes A, D .. E, B .. C, F: A jumps to B once, and C closes the loop with its conditional branch back to D. A
+// block's dfn is its place in the layout.
 class ROTATION {
 public:
     explicit ROTATION(BBLK* end) : E(end) {}
@@ -138,99 +139,96 @@ private:
 
 constexpr int MAX_TEST_NODES = 12;
 
-// The test that a jump back leads to, if it is all of its block and cheap enough to stand twice.
-const NODE* test_on_top(const BBLK* bb) {
-    const NODE* control = bb->branch();
-    if (!control || control->op != BRANCH) return nullptr;
-    const BBLK* head = control->left->lbl->bblock;
+// The test of a loop on top of it, if it is all of its block and cheap enough to stand twice.
+const NODE* test_on_top(const BBLK* head) {
     const LIST* test = head->statements;
-    if (head->dfn > bb->dfn || bb->dflink == head || !test || test->rest || test->first->op != IF) return nullptr;
+    if (!test || test->rest || test->first->op != IF || head->is_in_LIR_form()) return nullptr;
     if (test->first->left->op == ENDLOOP || count_nodes_in_tree(test->first->left) > MAX_TEST_NODES) return nullptr;
-    for (const EDGE* e = head->predecessors; e; e = e->rest)
-        if (ends_in_promise(e->first)) return nullptr;
     return test->first;
 }
 
-// Its copy takes the jump's place: one conditional branch in each iteration instead of a test and a jump.
-void close_loops_by_tests() {
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        if (bb->is_in_LIR_form()) continue;
-        const NODE* test = test_on_top(bb);
-        if (!test) continue;
-        LIST* last = bb->last_statement();
-        disconnect(bb, last->first->left->lbl->bblock);
-        erase_tree(last->first);
-        last->first = copy_tree(test);
-        fixup_edge_lists(bb, last->first);
-    }
+bool ends_in_jump_to(const BBLK* bb, const BBLK* target) {
+    const NODE* control = bb->branch();
+    return control && control->op == BRANCH && control->left->lbl->bblock == target && !bb->is_in_LIR_form();
 }
 
-// ---- What a loop leaves to stands behind it
+// The loop's blocks that jump back to a test on top of it, and are to test for themselves.
+struct TEST_TAKERS {
+    std::vector<BBLK*> back;
+    BBLK* promising = nullptr; // the one block ahead of the loop, if it holds a promise about the loop
+};
 
-constexpr int MAX_RUN = 32; // blocks
-
-bool falls_through(const BBLK* bb) { return bb->dflink && edge_memberp(bb->dflink, bb->successors); }
-
-// The blocks from `first` that control falls along; null if that holds `without` or the entry, or is long. `first`
-// itself must not be fallen into.
-BBLK* end_of_run(BBLK* first, const BBLK* without) {
-    if (first == currfuninfo->bb_list || falls_through(first->rdflink) || ends_in_promise(first->rdflink))
-        return nullptr;
-    BBLK* last = first;
-    for (int n = 0; last != without; last = last->dflink) {
-        if (!falls_through(last)) return ends_in_promise(last) ? nullptr : last;
-        if (++n == MAX_RUN) break;
+// A promise must be followed by the label of its loop: by the body's, if all who come to the test take a copy, the
+// block ahead too, so that no label is left at the test.
+bool find_takers(const NATURAL_LOOPS& loops, const BBLK* head, TEST_TAKERS* takers) {
+    bool promises = false, all_jump = true;
+    int ahead = 0;
+    for (const EDGE* e = head->predecessors; e; e = e->rest) {
+        BBLK* bb = e->first;
+        const bool is_back = loops.dominates(head, bb), jumps = ends_in_jump_to(bb, head);
+        if (is_back && jumps) takers->back.push_back(bb);
+        if (ends_in_promise(bb)) {
+            promises = true;
+            takers->promising = bb;
+        }
+        ahead += !is_back;
+        all_jump &= jumps;
     }
-    return nullptr;
+    if (!promises) return true;
+    return all_jump && ahead == 1 && !loops.dominates(head, takers->promising);
 }
 
-void move_run(BBLK* first, BBLK* last, BBLK* behind) {
-    BBLK* const entry = currfuninfo->bb_list;
-    BBLK *before = first->rdflink, *after = last->dflink, *next = behind->dflink;
+// Puts `first`, and what must stand behind it, behind `promising`; false where that cannot be.
+bool put_behind_promise(BBLK* promising, BBLK* first) {
+    BBLK *const entry = currfuninfo->bb_list, *last = first;
+    if (promising->dflink == first) return true;
+    for (; ends_in_promise(last); last = last->dflink)
+        if (last == promising || !last->dflink) return false;
+    if (first == entry || last == promising || ends_in_promise(first->rdflink)) return false;
+    BBLK *before = first->rdflink, *after = last->dflink;
     before->dflink = after;
     (after ? after : entry)->rdflink = before;
-    behind->dflink = first;
-    first->rdflink = behind;
+    BBLK* next = promising->dflink;
+    promising->dflink = first;
+    first->rdflink = promising;
     last->dflink = next;
     (next ? next : entry)->rdflink = last;
+    return true;
 }
 
-// A body that ends in a jump ahead to its loop's test costs that jump in each iteration. Where nothing falls into it, it
-// moves in front of the test, and what stood there jumps once.
-void put_bodies_before_tests() {
-    std::vector<BBLK*> jumps;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        if (bb->branch() && bb->branch()->op == BRANCH && !falls_through(bb)) jumps.push_back(bb);
-    for (BBLK* bb : jumps) {
-        BBLK* test = bb->successors->first;
-        if (test->dfn <= bb->dfn || test->branch()->op != IF || falls_through(bb) || ends_in_promise(test->rdflink))
-            continue;
-        for (const EDGE* e = test->successors; e; e = e->rest) {
-            if (e->first->dfn > bb->dfn || end_of_run(e->first, test) != bb) continue;
-            move_run(e->first, bb, test->rdflink);
-            break;
+BBLK* body_behind_test(const NATURAL_LOOPS& loops, const NATURAL_LOOP* loop, const NODE* test) {
+    BBLK *left = test->right->left->lbl->bblock, *right = test->right->right->lbl->bblock;
+    return loops.contains(loop, left) ? left : right;
+}
+
+void take_copy(BBLK* bb, BBLK* head, const NODE* test) {
+    LIST* last = bb->last_statement();
+    disconnect(bb, head);
+    erase_tree(last->first);
+    last->first = copy_tree(test);
+    fixup_edge_lists(bb, last->first);
+}
+
+// A copy of the test takes the jump's place: one conditional branch in each iteration instead of a test and a jump.
+// True if a test is reached no more.
+bool close_loops_by_tests() {
+    need(fact::loops);
+    const NATURAL_LOOPS& loops = *currfuninfo->loops; // kept until they are needed anew
+    bool unreached = false;
+    for (const auto& loop : loops.inner_first()) {
+        const BBLK* head = loop->header;
+        const NODE* test = test_on_top(head);
+        if (!test || head == currfuninfo->bb_list) continue;
+        TEST_TAKERS takers;
+        if (!find_takers(loops, head, &takers) || takers.back.empty()) continue;
+        if (BBLK* ahead = takers.promising) {
+            if (!put_behind_promise(ahead, body_behind_test(loops, loop.get(), test))) continue;
+            take_copy(ahead, loop->header, test);
         }
+        for (BBLK* bb : takers.back) take_copy(bb, loop->header, test);
+        unreached |= !head->predecessors;
     }
-}
-
-// A test neither of whose targets is the next block costs a jump on one of its edges. Where no block falls into the one
-// that the loop is left to, that moves behind the test, and staying in the loop takes one conditional branch.
-void put_exits_behind_tests() {
-    std::vector<BBLK*> tests;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        const NODE* control = bb->branch();
-        if (control && control->op == IF && control->left->op != ENDLOOP && !falls_through(bb) &&
-            edge_length(bb->successors) == 2)
-            tests.push_back(bb);
-    }
-    for (BBLK* bb : tests) {
-        BBLK *exit = bb->successors->first, *stay = bb->successors->rest->first;
-        // Of two back edges the one to the nearer header stays in the inner loop.
-        if (stay->dfn > bb->dfn || (exit->dfn <= bb->dfn && exit->dfn > stay->dfn)) std::swap(exit, stay);
-        if (falls_through(bb) || stay->dfn > bb->dfn) continue; // moved meanwhile, or no loop
-        BBLK* last = end_of_run(exit, bb);
-        if (last && last != bb) move_run(exit, last, bb);
-    }
+    return unreached;
 }
 
 } // namespace
@@ -250,10 +248,8 @@ void rotate_loops() {
     if (changed) renumber_bblocks();
     constexpr int SIZE_MATTERS_MOST = 1;
     if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
-        close_loops_by_tests();
-        put_bodies_before_tests();
+        if (close_loops_by_tests()) rebuildcfg();
         skip_decided_entry_tests();
-        put_exits_behind_tests();
-        renumber_bblocks();
+        lay_out_blocks();
     }
 }

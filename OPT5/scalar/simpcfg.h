@@ -48,5 +48,6 @@ bool remove_redundant_tests();
 bool cross_jump();
 // Loops whose first test is decided are entered behind it; needs layout positions for depth-first numbers.
 bool skip_decided_entry_tests();
+void lay_out_blocks();
 bool join_diamonds();
 bool may_be_arm_of_select(const NODE* assignment); // cheap, and safe where the condition does not hold

@@ -7,6 +7,7 @@
 #include "OPT5/simp/compare.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/linear_value.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -365,6 +366,11 @@ NODE* compare_pointers(NODE* t, struct LOOP* loop) {
     if (same_value(l, r)) return decided(t, holds_for_equals(t->op));
     if (!is_equality(t)) return t;
     if (is_null(r) && pointer_contains_adcon_term(l)) return decided(t, t->op == NEQ);
+    if (l->type->size == r->type->size) {
+        LINEAR_VALUE difference(l, loop);
+        difference.subtract(r);
+        if (difference.is_constant()) return decided(t, difference.constant_is(INT65(0)) == (t->op == EQ));
+    }
     // p + i == p + j, p + i == p: the offsets decide.
     auto base = [](NODE* p) { return (p->op == PLUS || p->op == MINUS) && p->left->type->is_pointer() ? p->left : p; };
     auto is_offset_sum = [](const NODE* p) {

@@ -24,7 +24,7 @@ void opposite(int x, int* q) {
 
 // FUNCTION: flag
 // NOT: found
-// COUNT 2: if (
+// COUNT 3: if (
 int flag(const int* q, int n) {
     int found = 0;
     for (int i = 0; i < n; ++i)
@@ -78,7 +78,7 @@ void long_tail(int x, int* q) {
 }
 
 // FUNCTION: closes_loop
-// COUNT 1: if (
+// COUNT 2: if (
 int closes_loop(int* q) {
     int again, n = 0;
     do {

@@ -29,8 +29,8 @@ int between(const int *from) {
 
 // What the loop starts from is not known here: a call, an assembly text or a pointer may have changed it.
 // FUNCTION: unknown
-// HAS: /^goto L\d+$/
-// HAS: /_n >= 5/
+// COUNT 1: if (!(_n < 5)
+// COUNT 1: if (!(_n >= 5)
 void unknown(void) {
     n = 0;
     *at += 5;

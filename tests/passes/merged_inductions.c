@@ -11,7 +11,7 @@ struct pair { int x, y; } pairs[40];
 // HAS: s += *$O$P0 * *$O$P1
 // HAS: $O$P0 += 1
 // NOT: i
-// HAS: if (!($O$P0 == $O$P2)) goto L1
+// HAS: if (!($O$P0 == $O$P2)) goto L2
 // COUNT 1: n > 0 ? x + n : x
 int dot(const int *x, const int *y, int n) {
     int s = 0;
@@ -163,7 +163,8 @@ long kept_aliased(int n) {
 // FUNCTION: promised
 // HAS: $O$P0 = &_w
 // HAS: /^pragma 39 MUST_ITERATE/
-// HAS: goto L2
+// HAS: /goto L2$/
+// HAS: L1:
 long promised(int n) {
     long s = 0;
 #pragma MUST_ITERATE(2)

@@ -21,12 +21,12 @@ long two_loops(int n) {
 }
 
 // FUNCTION: nested
-// HAS: /MUST_ITERATE\("", "4"/
-// NOT: /k \+= 1/
-// HAS: /j \+= 1/
 // HAS: /MUST_ITERATE\("", "2"/
 // NOT: /j \+= 1/
 // HAS: /k \+= 1/
+// HAS: /MUST_ITERATE\("", "4"/
+// NOT: /k \+= 1/
+// HAS: /j \+= 1/
 long nested(int n) {
     long sum = 0;
     int u, k, j;

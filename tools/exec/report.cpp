@@ -1,5 +1,6 @@
 // Reports after a run.
 #include "tools/exec/report.h"
+#include "tools/exec/loops.h"
 
 #include <algorithm>
 
@@ -44,6 +45,27 @@ void print_globals(const PROGRAM& p, FILE* out) {
     for (const auto& [name, digest] : lines) std::fprintf(out, "%016llx %s\n", ull(digest), name.c_str());
 }
 
+// Innermost loops: those whose one test closes them, how many of these close with one branch, and the others. A number
+// before each name, as operators have it.
+static void print_loops(const PROGRAM& p, FILE* out) {
+    uint64_t plain = 0, closed = 0, iterations = 0, closed_iterations = 0, branches = 0;
+    uint64_t tested = 0, tested_iterations = 0, tested_branches = 0;
+    for (const FUNCTION& f : p.functions)
+        for (const LOOP_COUNTS& loop : count_innermost_loops(f.code)) {
+            const bool own = loop.has_own_tests(), one = !own && loop.tests + loop.jumps == 1;
+            (own ? tested : plain)++;
+            (own ? tested_iterations : iterations) += loop.iterations;
+            (own ? tested_branches : branches) += loop.branches;
+            closed += one;
+            closed_iterations += one ? loop.iterations : 0;
+        }
+    std::fprintf(out,
+                 "loops %llu loops_closed %llu iterations %llu iterations_closed %llu loop_branches %llu "
+                 "tested_loops %llu tested_iterations %llu tested_branches %llu\n",
+                 ull(plain), ull(closed), ull(iterations), ull(closed_iterations), ull(branches), ull(tested),
+                 ull(tested_iterations), ull(tested_branches));
+}
+
 void print_stats(const PROGRAM& p, FILE* out) {
     const NODE_COUNTS& c = p.m.counts;
     uint64_t nodes = 0;
@@ -52,10 +74,12 @@ void print_stats(const PROGRAM& p, FILE* out) {
     for (const FUNCTION& f : p.functions)
         for (const STMT& s : f.code) statements += s.count;
     const uint64_t multiplies = c.by_op[op::MULT] + c.by_op[op::MULTASG] + c.by_op[op::SQR] + c.multiplies;
-    std::fprintf(out, "nodes %llu loads %llu stores %llu calls %llu branches %llu multiplies %llu statements %llu "
+    std::fprintf(out,
+                 "nodes %llu loads %llu stores %llu calls %llu branches %llu multiplies %llu statements %llu "
                  "operations %llu\n",
                  ull(nodes), ull(c.loads), ull(c.stores), ull(c.calls), ull(c.branches), ull(multiplies),
                  ull(statements), ull(operations(c)));
+    print_loops(p, out);
     for (int i = 0; i < 164; i++)
         if (c.by_op[i]) std::fprintf(out, "%12llu %s\n", ull(c.by_op[i]), if_node_info[i].name);
 }
@@ -71,5 +95,8 @@ void print_profile(const PROGRAM& p, FILE* out) {
         if (!f.calls) continue;
         std::fprintf(out, "%s: %llu calls, %llu nodes\n", f.name.c_str(), ull(f.calls), ull(nodes));
         for (auto [line, count] : lines) std::fprintf(out, "%8u %12llu\n", line, ull(count));
+        for (const LOOP_COUNTS& loop : count_innermost_loops(f.code))
+            std::fprintf(out, "%8u loop: %llu iterations, %llu branches; %d tests and %d jumps\n", loop.line,
+                         ull(loop.iterations), ull(loop.branches), loop.tests, loop.jumps);
     }
 }

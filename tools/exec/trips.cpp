@@ -1,6 +1,7 @@
 #include "tools/exec/trips.h"
 
 #include "IFILE/pragma.h"
+#include "tools/exec/loops.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -12,23 +13,6 @@ constexpr uint64_t no_limit = ~uint64_t{0};
 enum ROLE : uint8_t { OUTSIDE, STAYS, LEAVES_BEFORE, LEAVES_BEHIND, LEAVES_SOMEWHERE };
 
 bool leaves(ROLE role) { return role > STAYS; }
-
-using TARGETS = std::vector<uint32_t>;
-
-TARGETS successors(const std::vector<STMT>& code, uint32_t at) {
-    const STMT& s = code[at];
-    switch (s.kind) {
-    case S_EXPR: return {at + 1};
-    case S_BRANCH: return {s.target};
-    case S_CBRANCH: return {at + 1, s.target};
-    case S_SWITCH: {
-        TARGETS targets{s.table->other};
-        for (const auto& c : s.table->cases) targets.push_back(c.second);
-        return targets;
-    }
-    default: return {};
-    }
-}
 
 // Marks what follows from the statements in `work` along the edges, never entering `wall`.
 void spread(const std::vector<TARGETS>& edges, TARGETS work, uint32_t wall, std::vector<uint8_t>& marks) {

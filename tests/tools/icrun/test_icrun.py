@@ -102,6 +102,20 @@ class Files(unittest.TestCase):
                 self.assertTrue(done.stdout.startswith(plain))
                 self.assertRegex(done.stdout + done.stderr, text)
 
+    def test_innermost_loops_are_counted(self):
+        """A test and a jump in each iteration; a jump alone; a test of its own."""
+        source = """#include <stdlib.h>
+            int calls;
+            void leave(void) { if (++calls == 5) exit(0); }
+            int main(void) {
+            int i = 0, j, s = 0;
+            do { j = i; while (j < 7) j++; s += j; } while (++i < 3);
+            for (j = 0; j < 9; j++) if (j == s) return 1;
+            for (;;) leave(); }"""
+        done = icrun("--stats", self.compiled(source))
+        self.assertRegex(done.stderr, r"(?m)^loops 2 loops_closed 1 iterations 22 iterations_closed 4 loop_branches 43 "
+                                      r"tested_loops 1 tested_iterations 9 ")
+
 
 if __name__ == "__main__":
     unittest.main()

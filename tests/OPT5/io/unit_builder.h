@@ -10,62 +10,7 @@
 #include <string>
 #include <vector>
 
-namespace op {
-enum : int {
-    NOP = 0,
-    LABEL = 1,
-    NAME = 2,
-    SCON = 3,
-    ICON = 4,
-    FCON = 5,
-    PLUS = 6,
-    PLUSASG = 7,
-    MINUS = 8,
-    UMINUS = 10,
-    MULT = 11,
-    UMULT = 13,
-    ANDB = 14,
-    UAND = 16,
-    XORB = 19,
-    QUEST = 21,
-    COLON = 22,
-    ANDAND = 23,
-    OROR = 24,
-    LCON = 25,
-    RETURN = 36,
-    SWITCH = 40,
-    DEFAULT = 46,
-    CASE = 47,
-    COMMA = 56,
-    PCOMMA = 57,
-    ASG = 58,
-    COMMAOP = 59,
-    DIV = 60,
-    CALL = 70,
-    UCALL = 72,
-    LOOP = 74,
-    ENDLOOP = 75,
-    EXCLAIM = 76,
-    PLUSPLUS = 78,
-    EQ = 80,
-    NEQ = 81,
-    LT = 83,
-    GT = 85,
-    SCONV = 104,
-    PCONV = 105,
-    PMCONV = 106,
-    CBRANCH = 109,
-    EPVAL = 110,
-    ENDINIT = 112,
-    BRANCH = 114,
-    URETURN = 118,
-    NASSERT = 123,
-    ASSERT = 124,
-    ICALL = 129,
-    MCALL = 132,
-    UMCALL = 133,
-};
-}
+namespace op = if_op;
 
 // Writes one unit; then `optimize` runs the tool on it and `dump` shows what came out.
 class UnitTest : public testing::Test, protected IC_BUILDER {

@@ -6,19 +6,10 @@ int g, h, *gp = &g;
 unsigned u;
 long wide;
 float real;
-volatile int port;
 struct pair {
     int a, b;
     int field : 5;
 } s;
-
-// FUNCTION: overwritten
-// COUNT 1: _s.a =
-// HAS: _s.a = 2
-void overwritten(void) {
-    s.a = 1;
-    s.a = 2;
-}
 
 // FUNCTION: read_between
 // HAS: _g = n * 2 + 1
@@ -38,13 +29,6 @@ void steps(int n) {
     u += 5;
     wide += n;
     wide *= 3;
-}
-
-// FUNCTION: bits
-// HAS: _g &= n & 15
-void bits(int n) {
-    g &= n;
-    g &= 15;
 }
 
 // FUNCTION: temporary
@@ -108,13 +92,6 @@ void moved_target(void) {
     head->next->next = &n1;
 }
 
-// FUNCTION: watched
-// COUNT 2: _port =
-void watched(void) {
-    port = 1;
-    port = 2;
-}
-
 // FUNCTION: fields
 // HAS: *((unsigned int *)&_s + 2) = *((unsigned int *)&_s + 2) & 65504 | 2
 // NOT: _s
@@ -133,11 +110,9 @@ void calls_stay(void) {
 }
 
 int main(void) {
-    overwritten();
     read_between(4);
     put_i16(g);
     steps(9);
-    bits(13);
     put_i16(g);
     put_i32(wide);
     put_i16(u);
@@ -158,9 +133,8 @@ int main(void) {
     moved_target();
     put_i16(n1.next == &n2);
     put_i16(n2.next == &n1);
-    watched();
     fields();
-    put_i16(s.field + s.a);
+    put_i16(s.field);
     calls_stay();
     put_i16(g);
     return 0;

@@ -45,22 +45,6 @@ void across_call(int x, int* q) {
     if (x) b = q[1];
 }
 
-// FUNCTION: changed
-// COUNT 2: if (
-void changed(int x, int* q) {
-    if (x > 3) a = q[0];
-    x = q[2];
-    if (x > 3) b = q[1];
-}
-
-// FUNCTION: changed_by_call
-// COUNT 2: if (
-void changed_by_call(int* q) {
-    if (a > 3) b = q[0];
-    step();
-    if (a > 3) t = q[1];
-}
-
 // FUNCTION: changed_through_pointer
 // COUNT 2: if (
 void changed_through_pointer(int* p, int* q) {
@@ -117,8 +101,6 @@ int main(void) {
         opposite(x, q);
         put_i32(flag(q, x));
         across_call(x - 3, q);
-        changed(x, q);
-        changed_by_call(q);
         changed_through_pointer(q + x, q + 3);
         long_tail(x, q);
         put_i32(closes_loop(q));

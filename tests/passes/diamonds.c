@@ -16,22 +16,6 @@ int selected(int x, int y) {
     return r;
 }
 
-// FUNCTION: truth
-// COUNT 0: if (
-// COUNT 0: ?
-int truth(int x) {
-    if (x < 9) return 1;
-    return 0;
-}
-
-// FUNCTION: falsehood
-// COUNT 0: if (
-// COUNT 0: ?
-int falsehood(int x) {
-    if (x < 9) return 0;
-    return 1;
-}
-
 // FUNCTION: smaller
 // COUNT 0: if (
 // HAS: /return .*__min\(/
@@ -132,8 +116,6 @@ int main(void) {
     volatile float zero = 0.0F;
     static const int32_t list[5] = {-70000, 5, 90000, -3, 89999};
     put_i16(selected(4, 10) + selected(3, 10));
-    put_i16(truth(8) * 10 + truth(9));
-    put_i16(falsehood(8) * 10 + falsehood(9));
     put_i16(smaller(-5, 4) * 10 + smaller(7, 6));
     put_i32(largest(list, 5));
     for (int i = 6; i < 10; i++) put_i16(bounded(i, i - 8) * 100 + not_the_bound(i));

@@ -41,14 +41,6 @@ int members(int i) {
     return p.x * p.y + (int)p.z;
 }
 
-// FUNCTION: initialized
-// COUNT 0: struct
-long initialized(int i) {
-    struct point p = {1, 2, 3};
-    if (i) p.z += i;
-    return p.z + p.x;
-}
-
 // FUNCTION: copied
 // COUNT 0: =struct
 // COUNT 0: /\d+ [pr]: struct/
@@ -95,15 +87,6 @@ int through_memory(int i) {
     p.z = 2;
     *where = p;
     return p.y;
-}
-
-// FUNCTION: has_address
-// HAS: /\d+ p: struct point/
-int has_address(int i) {
-    struct point p;
-    p.x = i;
-    p.y = p.z = 2;
-    return sum(&p) + p.x;
 }
 
 // FUNCTION: member_address
@@ -171,8 +154,6 @@ int main(void) {
     struct link second = {0, 7}, first = {&second, 3};
     struct point p = {10, 20, 30}, q;
     put_i16(members(3));
-    put_i32(initialized(0));
-    put_i32(initialized(5));
     put_i16(copied(&p));
     put_i16(p.x);
     put_i16(nested(6));
@@ -180,7 +161,6 @@ int main(void) {
     put_i16(last_value(&first));
     put_i16(through_memory(4));
     put_i16(origin.y);
-    put_i16(has_address(1));
     put_i16(member_address(8));
     put_i16(passed(4));
     put_i16(returned(9).x);

@@ -16,18 +16,6 @@ int chain(int n) {
     return n + x + y;
 }
 
-// FUNCTION: decided
-// NOT: /\bif \(/
-// COUNT 1: _put_i16(
-// HAS: _put_i16(n + 2)
-void decided(int n) {
-    int mode = 3;
-    if (mode > 2)
-        put_i16(n + 2);
-    else
-        put_i16(n);
-}
-
 // FUNCTION: chosen
 // NOT: /switch \(/
 // HAS: _put_i16(n + 7)
@@ -50,14 +38,6 @@ void addresses(int i) {
     *p = 5;
     *q = 6;
     r[i] = 7;
-}
-
-// FUNCTION: parameter
-// HAS: /n: const int/
-// HAS: return n * 3
-int parameter(int n) {
-    int copy = n;
-    return copy * 3;
 }
 
 // FUNCTION: once
@@ -94,16 +74,6 @@ int one_assignment_over_turns(int n) {
     return sum;
 }
 
-// FUNCTION: assigned_twice
-// HAS: x = 1
-// HAS: x = 2
-// HAS: return x
-int assigned_twice(int n) {
-    int x = 1;
-    if (n) x = 2;
-    return x;
-}
-
 // FUNCTION: reached_by_pointer
 // HAS: x = 1
 // HAS: /return .*x/
@@ -129,15 +99,6 @@ int stepped(int n) {
     return x;
 }
 
-// FUNCTION: part_of_structure
-// HAS: return n * 2 + 2
-int part_of_structure(int n) {
-    struct pair t;
-    t.a = n;
-    t.b = 2;
-    return t.a * 2 + t.b;
-}
-
 // A string is one object: the pointer to it is not copied.
 // FUNCTION: one_string
 // COUNT 1: "abc
@@ -157,19 +118,15 @@ int embedded(int n) {
 int main(void) {
     h[1] = 3;
     put_i16(chain(5));
-    decided(6);
     chosen(8);
     addresses(2);
     put_i16(g + s.b + h[2]);
-    put_i16(parameter(4));
     put_i16(once());
     put_i16(kept_over_turns(9));
     put_i16(one_assignment_over_turns(10));
-    put_i16(assigned_twice(1));
     put_i16(reached_by_pointer());
     put_i16(watched());
     put_i16(stepped(5));
-    put_i16(part_of_structure(7));
     put_i16(one_string());
     put_i16(embedded(3));
     return 0;

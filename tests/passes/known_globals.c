@@ -4,10 +4,7 @@
 #include <zrun.h>
 
 static const int limit = 12, table[4] = {3, 5, 7, 11};
-static const float scale = 0.5f;
-static const long wide[3] = {100000, 2, 3};
 const unsigned char text[] = "AZ";
-static const volatile int port = 3;
 static int variable = 4, changing[2] = {1, 2};
 int* where = &variable;
 static const int grid[2][3] = {{1, 2, 3}, {4, 5, 6}};
@@ -36,17 +33,9 @@ int never_written(int n) { return n + setting; }
 // HAS: /return .*_counted.*_exposed|return .*_exposed.*_counted/
 int written_elsewhere(void) { return counted + exposed; }
 
-// FUNCTION: scalars
-// HAS: return n + 12
-int scalars(int n) { return n + limit; }
-
 // FUNCTION: elements
 // HAS: return n + 18
 int elements(int n) { return n + table[1] + table[2] + grid[1][2]; }
-
-// FUNCTION: wider
-// HAS: return 100003
-long wider(void) { return wide[0] + wide[2]; }
 
 // FUNCTION: letters
 // HAS: return 155
@@ -59,10 +48,6 @@ int through_pointer(void) {
     return p[1] + p[2];
 }
 
-// FUNCTION: real
-// HAS: return x * 0x1p-1
-float real(float x) { return x * scale; }
-
 // FUNCTION: unknown_place
 // HAS: /return .*_table/
 int unknown_place(int i) { return table[i]; }
@@ -70,10 +55,6 @@ int unknown_place(int i) { return table[i]; }
 // FUNCTION: beyond
 // HAS: /return .*_grid/
 int beyond(int n) { return n ? 0 : *((const int*)grid + 7); }
-
-// FUNCTION: watched
-// HAS: return _port
-int watched(void) { return port; }
 
 // FUNCTION: written
 // HAS: /return .*_changing.*_variable/
@@ -94,15 +75,11 @@ int main(void) {
     put_i16(never_written(3));
     put_i16(written_elsewhere());
     changing[1] = 3;
-    put_i16(scalars(1));
     put_i16(elements(2));
-    put_i32(wider());
     put_i16(letters());
     put_i16(through_pointer());
-    put_f32(real(3));
     put_i16(unknown_place(3));
     put_i16(beyond(1));
-    put_i16(watched());
     put_i16(written());
     put_i16(*address());
     return 0;

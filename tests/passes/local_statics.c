@@ -13,15 +13,6 @@ int scratch(int x) {
     return s - x;
 }
 
-// FUNCTION: both_paths
-// HAS: /\d+ _t\$\d: .*level 2/
-long both_paths(int x) {
-    static long t = 9;
-    if (x) t = 100;
-    else t = 7;
-    return t * x + t;
-}
-
 // The call's own argument is read before anything can happen.
 // FUNCTION: as_argument
 // HAS: /\d+ _a\$\d: .*level 2/
@@ -38,14 +29,6 @@ int one_path(int x) {
     static int o = 5;
     if (x) o = x;
     return o;
-}
-
-// FUNCTION: counter
-// COUNT 0: /\d+ _c\$\d: /
-// HAS: /_c\$\d/
-int counter(void) {
-    static int c;
-    return ++c;
 }
 
 // An inner call writes what the outer one reads.
@@ -94,12 +77,10 @@ int loop_first(int n) {
 
 int main(void) {
     put_i16(scratch(3) + scratch(7));
-    put_i32(both_paths(0) + both_paths(4));
     put_i16(as_argument(4));
     put_i16(one_path(0));
     put_i16(one_path(8));
     put_i16(one_path(0));
-    put_i16(counter() + counter());
     put_i16(entered_again(3));
     put_i16(has_pointer(4));
     put_i16(watched(4));

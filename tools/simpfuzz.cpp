@@ -1,13 +1,14 @@
 // Random trees through the simplifier: what comes out must have the value and the side effects of what went in.
 //
 //   simpfuzz [--count N] [--seed S] [--jobs J] [--assignments N] [--depth N] [--most N] [--thorough] [--strict]
-//            [--no-floats] [--no-pointers] [--no-effects] [--show]
+//            [--no-floats] [--no-pointers] [--no-effects] [--show] [--hits]
 //
 // Tree number n of a run has the seed S + n, so that `--count 1 --seed X` shows a finding again. Each finding is cut
 // down to a small tree. All checks but the first take turns unless `--thorough` is said. `--strict` also reports trees
-// that a second simplification changes. `--show` prints each tree and what became of it. The status is 1 if there was a
-// finding.
+// that a second simplification changes. `--show` prints each tree and what became of it, `--hits` how often each row of
+// the patterns applied. The status is 1 if there was a finding.
 
+#include "OPT5/simp/patterns.h"
 #include "tools/treecheck/campaign.h"
 
 #include <algorithm>
@@ -15,6 +16,7 @@
 #include <cstdlib>
 #include <string>
 
+#include <sys/mman.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -25,13 +27,14 @@ namespace {
 [[noreturn]] void usage() {
     fprintf(stderr, "usage: simpfuzz [--count N] [--seed S] [--jobs J] [--assignments N] [--depth N] [--most N] "
                     "[--thorough] [--strict]\n"
-                    "                [--no-floats] [--no-pointers] [--no-effects] [--show]\n");
+                    "                [--no-floats] [--no-pointers] [--no-effects] [--show] [--hits]\n");
     exit(2);
 }
 
 struct WORDS {
     CAMPAIGN campaign;
     unsigned jobs = 1;
+    bool hits = false;
 };
 
 WORDS arguments(int argc, char** argv) {
@@ -63,6 +66,8 @@ WORDS arguments(int argc, char** argv) {
             c.strict = true;
         else if (word == "--show")
             c.show = true;
+        else if (word == "--hits")
+            w.hits = true;
         else if (word == "--no-floats")
             c.trees.floats = false;
         else if (word == "--no-pointers")
@@ -112,11 +117,26 @@ OUTCOME run_in_parts(const CAMPAIGN& whole, unsigned jobs) {
     return all;
 }
 
+// Counters that the parts of a run share.
+uint64_t* shared_counters(int n) {
+    void* p = mmap(nullptr, static_cast<std::size_t>(n) * sizeof(uint64_t), PROT_READ | PROT_WRITE,
+                   MAP_SHARED | MAP_ANONYMOUS, -1, 0);
+    return p == MAP_FAILED ? nullptr : static_cast<uint64_t*>(p);
+}
+
+void print_hits() {
+    if (!rules::pattern_hits) return;
+    for (int row = 0; row < rules::pattern_rows(); ++row)
+        printf("%10llu  %s\n", static_cast<unsigned long long>(rules::pattern_hits[row]), rules::pattern_row_text(row));
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
     const WORDS w = arguments(argc, argv);
+    if (w.hits) rules::pattern_hits = shared_counters(rules::pattern_rows());
     const OUTCOME o = w.jobs > 1 ? run_in_parts(w.campaign, w.jobs) : run_campaign(w.campaign, print_finding);
+    print_hits();
     printf("%llu trees, %llu runs, %d findings\n", static_cast<unsigned long long>(o.trees),
            static_cast<unsigned long long>(o.runs), o.findings);
     return o.findings ? 1 : 0;

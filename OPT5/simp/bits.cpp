@@ -6,6 +6,7 @@
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/compare.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 
@@ -116,52 +117,6 @@ NODE* meet_itself(NODE* t, struct LOOP*) {
     return nullptr;
 }
 
-NODE* copy_of_other(const NODE* node, const NODE* x) {
-    return same_value(node->left, x)    ? copy_tree(node->right)
-           : same_value(node->right, x) ? copy_tree(node->left)
-                                        : nullptr;
-}
-
-// x op (x op2 y), for `x` on either side: absorption and what is left of it.
-NODE* absorb(NODE* t, NODE* x, const NODE* inner, struct LOOP* loop) {
-    if (is_icon(x) || !is_bit_op(inner->op) || !operands_have_type(inner) || !is_pure(t)) return nullptr;
-    TYPE* type = t->type;
-    const int op = t->op;
-    const bool holds_complement = is_complement_of(inner->left, x) || is_complement_of(inner->right, x);
-    if (holds_complement && ((op == ANDB && inner->op == ORB) || (op == ORB && inner->op == ANDB))) {
-        // x & (~x | y), x | (~x & y): the complement adds nothing
-        NODE *y = copy_tree(is_complement_of(inner->left, x) ? inner->right : inner->left), *kept = copy_tree(x);
-        erase_tree(t);
-        return made(op, kept, y, type, loop);
-    }
-    NODE* y = copy_of_other(inner, x);
-    if (!y) return nullptr;
-    if ((op == ANDB && inner->op == ORB) || (op == ORB && inner->op == ANDB)) {
-        erase_tree(y);
-        return replace_by(t, copy_tree(x));
-    }
-    if (op != XORB && inner->op == op) { // x & (x & y)
-        erase_tree(y);
-        return replace_by(t, copy_tree(inner));
-    }
-    if (op == XORB && inner->op == XORB) return replace_by(t, y);
-    if (op == ORB) { // x | (x ^ y)
-        NODE* kept = copy_tree(x);
-        erase_tree(t);
-        return made(ORB, kept, y, type, loop);
-    }
-    // x ^ (x & y), x & (x ^ y): x & ~y.  x ^ (x | y): y & ~x.
-    NODE *kept = copy_tree(x), *masked = y;
-    if (inner->op == ORB) std::swap(kept, masked);
-    erase_tree(t);
-    return made(ANDB, kept, made(NOTB, masked, nullptr, type, loop), type, loop);
-}
-
-NODE* absorb_either(NODE* t, struct LOOP* loop) {
-    if (NODE* r = absorb(t, t->left, t->right, loop)) return r;
-    return absorb(t, t->right, t->left, loop);
-}
-
 // ~x & ~y is ~(x | y); ~x ^ y is ~(x ^ y); ~x ^ c is x ^ ~c.
 NODE* complements_outward(NODE* t, struct LOOP* loop) {
     const bool left = is_unary(t->left, NOTB), right = is_unary(t->right, NOTB);
@@ -180,23 +135,13 @@ NODE* complements_outward(NODE* t, struct LOOP* loop) {
     return complements ? made(NOTB, t, nullptr, type, loop) : t;
 }
 
-// (x & y) op (x & z) is x & (y op z), and for | and & exchanged; also (x & ~y) | (~x & y) is x ^ y.
+// (x & y) op (x & z) is x & (y op z), and for | and & exchanged.
 NODE* factor_out(NODE* t, struct LOOP* loop) {
     NODE *l = t->left, *r = t->right;
     if (l->op != r->op || (l->op != ANDB && l->op != ORB) || l->op == t->op || !operands_have_type(l) ||
         !operands_have_type(r))
         return nullptr;
     if ((l->op == ORB && t->op != ANDB) || !is_pure(l) || !is_pure(r)) return nullptr;
-    if (t->op == ORB && l->op == ANDB)
-        for (int side = 0; side < 4; ++side) {
-            NODE *a = side & 1 ? l->right : l->left, *b = side & 1 ? l->left : l->right;
-            NODE *c = side & 2 ? r->right : r->left, *d = side & 2 ? r->left : r->right;
-            if (!is_complement_of(b, c) || !is_complement_of(d, a)) continue;
-            NODE *x = copy_tree(a), *y = copy_tree(c);
-            TYPE* type = t->type;
-            erase_tree(t);
-            return made(XORB, x, y, type, loop);
-        }
     for (int side = 0; side < 4; ++side) {
         NODE *&a = side & 1 ? l->right : l->left, *&b = side & 2 ? r->right : r->left;
         if (is_icon(a) != is_icon(b) || !same_value(a, b)) continue;
@@ -209,20 +154,6 @@ NODE* factor_out(NODE* t, struct LOOP* loop) {
         return simp_node(to_binary(t, outer, common, inner), loop);
     }
     return nullptr;
-}
-
-// (x | y) ^ (x & y) is x ^ y.
-NODE* or_without_and(NODE* t, struct LOOP* loop) {
-    NODE *l = t->left, *r = t->right;
-    if (t->op != XORB || !((is_node(l, ORB) && is_node(r, ANDB)) || (is_node(l, ANDB) && is_node(r, ORB))))
-        return nullptr;
-    const bool straight = same_value(l->left, r->left) && same_value(l->right, r->right);
-    const bool crossed = same_value(l->left, r->right) && same_value(l->right, r->left);
-    if (!straight && !crossed) return nullptr;
-    NODE *x = copy_tree(l->left), *y = copy_tree(l->right);
-    TYPE* type = t->type;
-    erase_tree(t);
-    return made(XORB, x, y, type, loop);
 }
 
 // (x << n) op (y << n) is (x op y) << n, and for right shifts.
@@ -274,11 +205,10 @@ const RULE bit_rules[] = {trivial_constant,
                           constant_against_known_bits,
                           mask_under_or,
                           meet_itself,
-                          absorb_either,
+                          by_pattern,
                           complements_outward,
                           invert_compare,
                           factor_out,
-                          or_without_and,
                           common_shift_outward,
                           cast_outward,
                           join_compares};
@@ -342,15 +272,6 @@ NODE* complement_sum(NODE* t, struct LOOP* loop) {
         erase_node(t);
         return simp_node(inner, loop);
     }
-    // ~(~x + y) is x - y
-    if (is_node(inner, PLUS) && (is_unary(inner->left, NOTB) ||
-                                 (is_unary(inner->right, NOTB) && is_pure(inner->left) && is_pure(inner->right)))) {
-        if (!is_unary(inner->left, NOTB)) std::swap(inner->left, inner->right);
-        inner->left = take_left(inner->left);
-        inner->op = MINUS;
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
     if (is_node_with_icon(inner, XORB)) {
         set_icon(inner->right, ~inner->right->u.lval);
         erase_node(t);
@@ -385,7 +306,7 @@ NODE* simp_unary(NODE* t, struct LOOP* loop) {
         return coerce_to_type(type, operand);
     }
     if (NODE* r = t->op == UMINUS ? negate_sum(t, loop) : complement_sum(t, loop)) return r;
-    if (NODE* r = t->op == UMINUS ? negated_sign_test(t, loop) : nullptr) return r;
+    if (NODE* r = t->op == UMINUS ? negated_sign_test(t, loop) : by_pattern(t, loop)) return r;
     return simp_by_known_bits(t);
 }
 

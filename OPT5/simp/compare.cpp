@@ -8,6 +8,7 @@
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/linear_value.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -351,9 +352,9 @@ NODE* compare_low_bits(NODE* t, struct LOOP* loop) {
 }
 
 const RULE compare_rules[] = {
-    decide,           compare_truth_value, compare_single_bit, order_at_the_end, move_constant_across,
-    undo_on_constant, test_against_zero,   compare_computed,   compare_arms,     cancel_common_term,
-    undo_on_both,     compare_low_bits,    compare_uncast};
+    decide,           compare_truth_value, compare_single_bit, order_at_the_end, move_constant_across, undo_on_constant,
+    by_pattern,       test_against_zero,   compare_computed,   compare_arms,     cancel_common_term,   undo_on_both,
+    compare_low_bits, compare_uncast};
 
 // ---- Pointers
 bool is_null(const NODE* t) {

@@ -98,14 +98,7 @@ NODE* make_minmax(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
     return fix_BIF_types(mk_ICALL(bif->name.c_str(), args, type));
 }
 
-namespace {
-
-struct EXTREMUM {
-    NODE *a = nullptr, *b = nullptr; // null: no such call
-    bool maximum = false;
-};
-
-EXTREMUM extremum(const NODE* t) {
+EXTREMUM extremum_of(const NODE* t) {
     if (t->op != ICALL || !t->left || t->left->op != COMMA || t->left->left->op == COMMA) return {};
     const BIF* bif = find_target_BIF_descriptor(t->u.name);
     if (!bif || bif->nparams != 2 || !bif->has(IS_PROPER_MINVAL | IS_PROPER_MAXVAL)) return {};
@@ -113,12 +106,20 @@ EXTREMUM extremum(const NODE* t) {
     return {t->left->left, t->left->right, bif->has(IS_PROPER_MAXVAL)};
 }
 
-NODE* call_of(bool maximum, NODE* a, NODE* b, TYPE* type, struct LOOP* loop) {
+static const BIF* extremum_BIF(bool maximum, TYPE* type) {
     const char* generic = minmax_name(type, maximum);
-    const BIF* bif = generic ? find_target_BIF_descriptor(generic) : nullptr;
+    return generic ? find_target_BIF_descriptor(generic) : nullptr;
+}
+
+bool has_extremum(bool maximum, TYPE* type) { return extremum_BIF(maximum, type) != nullptr; }
+
+NODE* extremum_call(bool maximum, NODE* a, NODE* b, TYPE* type, struct LOOP* loop) {
+    const BIF* bif = extremum_BIF(maximum, type);
     if (!bif) return nullptr;
     return simp_node(mk_ICALL(bif->name.c_str(), maketree(COMMA, a, b, tp->int_t), type), loop);
 }
+
+namespace {
 
 // One of the arguments, with the effects of the other.
 NODE* only_argument(NODE* t, bool first) {
@@ -132,7 +133,7 @@ NODE* only_argument(NODE* t, bool first) {
 
 // ---- Rules of a call whose arguments have the call's type
 NODE* known_order(NODE* t, struct LOOP* loop) {
-    const EXTREMUM e = extremum(t);
+    const EXTREMUM e = extremum_of(t);
     INT65 min_a, max_a, min_b, max_b;
     if (!calculate_bounds(e.a, loop, &min_a, &max_a) || !calculate_bounds(e.b, loop, &min_b, &max_b)) return nullptr;
     const bool same = is_pure(e.a) && same_value(e.a, e.b), a_is_less = max_a <= min_b, b_is_less = max_b <= min_a;
@@ -151,10 +152,10 @@ NODE* constant_to_the_right(NODE* t, struct LOOP* loop) {
 // min(min(x, c), d) is min(x, min(c, d)); max(min(x, c), d) of a d that is above c is d, by the bounds. min(x, max(x,
 // y)) is x; min(x, min(x, y)) is the inner one.
 NODE* join_limits(NODE* t, struct LOOP* loop) {
-    const EXTREMUM outer = extremum(t);
+    const EXTREMUM outer = extremum_of(t);
     for (bool left : {true, false}) {
         NODE *inner = left ? outer.a : outer.b, *other = left ? outer.b : outer.a;
-        const EXTREMUM e = extremum(inner);
+        const EXTREMUM e = extremum_of(inner);
         if (!e.a) continue;
         if (is_pure(inner) && (same_value(e.a, other) || same_value(e.b, other)))
             return only_argument(t, left == (e.maximum == outer.maximum));
@@ -168,7 +169,7 @@ NODE* join_limits(NODE* t, struct LOOP* loop) {
 
 // Of two values that were widened the narrow ones: the cast keeps their order.
 NODE* extremum_under_cast(NODE* t, struct LOOP* loop) {
-    const EXTREMUM e = extremum(t);
+    const EXTREMUM e = extremum_of(t);
     auto widens = [](const NODE* n) {
         return n->op == SCONV && is_integer(n->left->type) && n->left->type->size < n->type->size &&
                n->left->type->size >= tp->int_t->size && is_signed(n->left->type) && !is_bitfield_access(n->left);
@@ -182,12 +183,12 @@ NODE* extremum_under_cast(NODE* t, struct LOOP* loop) {
     erase_node(t);
     NODE* b = is_icon(e.b) ? mk_ICON(e.b->u.lval, narrow) : e.b->left;
     erase_node(e.b);
-    return coerced(wide, call_of(e.maximum, take_left(e.a), b, narrow, loop), loop);
+    return coerced(wide, extremum_call(e.maximum, take_left(e.a), b, narrow, loop), loop);
 }
 
 } // namespace
 
-bool is_minmax_call(const NODE* t) { return extremum(t).a != nullptr; }
+bool is_minmax_call(const NODE* t) { return extremum_of(t).a != nullptr; }
 
 NODE* simp_minmax_ICALL(NODE* t, struct LOOP* loop) {
     if (!is_minmax_call(t)) return t;
@@ -210,7 +211,7 @@ static NODE* clamp_of_QUEST(NODE* t, struct LOOP* loop) {
     NODE *c = t->left, *a = t->right->left, *b = t->right->right;
     const bool limit_first = is_icon(a);
     NODE *limit = limit_first ? a : b, *inner = limit_first ? b : a;
-    const EXTREMUM e = extremum(inner);
+    const EXTREMUM e = extremum_of(inner);
     if (!e.a || !is_icon(limit) || !is_icon(e.b) || !is_icon(c->right) || !same_value(c->left, e.a)) return nullptr;
     if (!equiv_mtypes(c->left->type, t->type) || !equiv_mtypes(limit->type, t->type)) return nullptr;
     const int op = limit_first ? c->op : boolean_inv[c->op]; // holds where the limit is the value
@@ -218,7 +219,7 @@ static NODE* clamp_of_QUEST(NODE* t, struct LOOP* loop) {
     if (less < 0 || !is_bound(limit, c->right, op, true)) return nullptr;
     const bool maximum = less == 1; // of the outer call
     if (maximum == e.maximum || (maximum ? limit->u.lval > e.b->u.lval : limit->u.lval < e.b->u.lval)) return nullptr;
-    NODE* call = call_of(maximum, copy_tree(inner), copy_tree(limit), t->type, loop);
+    NODE* call = extremum_call(maximum, copy_tree(inner), copy_tree(limit), t->type, loop);
     if (call) erase_tree(t);
     return call;
 }

@@ -9,6 +9,7 @@
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -179,9 +180,16 @@ NODE* multiply_under_cast(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
-const RULE product_rules[] = {multiply_by_small_constant, multiply_negation,     multiply_absolutes,
-                              multiply_shifted_back,      join_factors,          distribute,
-                              undo_exact_division,        multiply_truth_values, multiply_under_cast};
+const RULE product_rules[] = {multiply_by_small_constant,
+                              multiply_negation,
+                              multiply_absolutes,
+                              multiply_shifted_back,
+                              join_factors,
+                              distribute,
+                              undo_exact_division,
+                              multiply_truth_values,
+                              multiply_under_cast,
+                              by_pattern};
 
 // ---- Powers: x ** n times x ** m
 bool same_base(const NODE* power, const NODE* x) { return power->op == EXPT && same_value(power->left, x); }
@@ -373,14 +381,14 @@ NODE* simp_MULT(NODE* t, struct LOOP* loop) {
 NODE* simp_DIV(NODE* t, struct LOOP* loop) {
     if (t->type->is_float()) return simp_float_DIV(t, loop);
     if (!operands_have_type(t)) return t;
-    static const RULE table[] = {divide_trivially, divide_negations, simp_DIV_by_ICON};
+    static const RULE table[] = {divide_trivially, divide_negations, simp_DIV_by_ICON, by_pattern};
     t = first_that_applies(table, t, loop);
     return t->op == DIV ? simp_by_known_bits(t) : t;
 }
 
 NODE* simp_MOD(NODE* t, struct LOOP* loop) {
     if (!operands_have_type(t)) return t;
-    static const RULE table[] = {divide_trivially, remainder_of_division};
+    static const RULE table[] = {divide_trivially, remainder_of_division, by_pattern};
     t = first_that_applies(table, t, loop);
     return t->op == MOD ? simp_by_known_bits(t) : t;
 }

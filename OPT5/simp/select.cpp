@@ -7,6 +7,7 @@
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/minmax.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -297,6 +298,7 @@ const RULE select_rules[] = {constant_condition,
                              logical_arms,
                              condition_asked_again,
                              absolute_value,
+                             by_pattern,
                              minmax_of_QUEST,
                              ordered_arms,
                              common_cast_outward};

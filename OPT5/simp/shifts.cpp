@@ -4,6 +4,7 @@
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 
@@ -104,8 +105,8 @@ NODE* narrow_operand(NODE* t, struct LOOP* loop) {
     return narrow_to_mask(&t->left, t->op == SLL ? mask >> n : mask << n & mask) ? simp_node(t, loop) : nullptr;
 }
 
-const RULE shift_rules[] = {shift_by_nothing, join_shifts,   shift_there_and_back,
-                            shift_under_cast, shift_product, narrow_operand};
+const RULE shift_rules[] = {shift_by_nothing, join_shifts, shift_there_and_back, shift_under_cast, shift_product,
+                            narrow_operand,   by_pattern};
 
 } // namespace
 

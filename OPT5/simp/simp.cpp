@@ -7,6 +7,7 @@
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/known_bits.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 
 #include "OPT5/ir/bblk.h"
@@ -363,6 +364,7 @@ NODE* simp_tree(NODE* tree, struct LOOP* loop) {
 }
 
 void init_simplifier() {
+    compile_patterns();
     type_ops_callbacks.find_known_zeros = find_known_zeros;
     install_symbolic_callbacks();
     install_BIF_simplifiers();

@@ -8,6 +8,7 @@
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/linear.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
@@ -143,34 +144,8 @@ NODE* remove_negations(NODE* t, struct LOOP* loop) {
     return nullptr;
 }
 
-// ---- Terms that cancel. What is kept has one operand's effects; the others have none.
-NODE* keep_term(NODE* t, NODE* holder, bool left, bool negative, struct LOOP* loop) {
-    NODE* kept = left ? holder->left : holder->right;
-    (left ? holder->left : holder->right) = nullptr;
-    if (left) std::swap(holder->left, holder->right); // a node's only operand is its left one
-    TYPE* type = t->type;
-    erase_tree(t);
-    return negative ? made(UMINUS, kept, nullptr, type, loop) : kept; // the number that the sum was
-}
-
-// The term that is left may have effects of its own only where it is not evaluated between the two that cancel.
-NODE* cancel_terms(NODE* t, struct LOOP* loop) {
-    NODE *l = t->left, *r = t->right;
-    if (t->op == MINUS && same_value(l, r)) return constant_for(t, INT65(0));
-    if (is_sum(l)) {
-        // (x + y) - y, (x - y) + y: x.  (x + y) - x: y.  (x - y) - x: -y.
-        if (l->op != t->op && same_value(l->right, r)) return keep_term(t, l, true, false, loop);
-        if (t->op == MINUS && same_value(l->left, r) && is_pure(l->right))
-            return keep_term(t, l, false, l->op == MINUS, loop);
-    }
-    if (is_sum(r)) {
-        // x - (x + y): -y.  x - (x - y): y.  x - (y + x): -y.  x + (y - x): y.
-        if (t->op == MINUS && same_value(l, r->left)) return keep_term(t, r, false, r->op == PLUS, loop);
-        if (!is_pure(r->left)) return nullptr;
-        if (t->op == MINUS && r->op == PLUS && same_value(l, r->right)) return keep_term(t, r, true, true, loop);
-        if (t->op == PLUS && r->op == MINUS && same_value(l, r->right)) return keep_term(t, r, true, false, loop);
-    }
-    return nullptr;
+NODE* cancel(NODE* t, struct LOOP*) {
+    return t->op == MINUS && same_value(t->left, t->right) ? constant_for(t, INT65(0)) : nullptr;
 }
 
 // ---- Common factors: x * c1 + x * c2, x + x, x * y + x * z
@@ -234,71 +209,9 @@ NODE* sum_with_complement(NODE* t, struct LOOP* loop) {
     return simp_node(to_binary(t, MINUS, icon, x), loop);
 }
 
-// The operand of the commutative node `t` that isn't `x`; null if neither is.
-NODE* other_operand(const NODE* t, const NODE* x) {
-    return same_value(t->left, x) ? t->right : same_value(t->right, x) ? t->left : nullptr;
-}
-
-// (x | y) - y is x & ~y; x - (x & y) is x & ~y; (x | y) - (x & y) is x ^ y; (x & y) + (x | y) is x + y.
-NODE* sum_of_bits(NODE* t, struct LOOP* loop) {
-    NODE *l = t->left, *r = t->right;
-    if (!is_pure(l) || !is_pure(r)) return nullptr;
-    const bool crosses =
-        (is_node(l, ORB) && is_node(r, ANDB)) || (t->op == PLUS && is_node(l, ANDB) && is_node(r, ORB));
-    if (crosses && ((same_value(l->left, r->left) && same_value(l->right, r->right)) ||
-                    (same_value(l->left, r->right) && same_value(l->right, r->left)))) {
-        NODE *x = copy_tree(l->left), *y = copy_tree(l->right);
-        const int op = t->op == PLUS ? PLUS : XORB;
-        TYPE* type = t->type;
-        erase_tree(t);
-        return made(op, x, y, type, loop);
-    }
-    if (t->op != MINUS) return nullptr;
-    const NODE *x = nullptr, *y = nullptr;
-    if (is_node(l, ORB) && (x = other_operand(l, r))) y = r;
-    if (!y && is_node(r, ANDB) && (y = other_operand(r, l))) x = l;
-    if (!x || !y) return nullptr;
-    NODE *kept = copy_tree(x), *masked = copy_tree(y);
-    TYPE* type = t->type;
-    erase_tree(t);
-    return made(ANDB, kept, made(NOTB, masked, nullptr, type, loop), type, loop);
-}
-
-// x - (x / c) * c is x % c; (x / c) * c + x % c is x.
-NODE* remainder(NODE* t, struct LOOP* loop) {
-    auto quotient = [](const NODE* n) {
-        return is_node_with_icon(n, MULT) && is_node_with_icon(n->left, DIV) &&
-               n->right->u.lval == n->left->right->u.lval && !n->right->u.lval.is_zero();
-    };
-    NODE *l = t->left, *r = t->right;
-    if (t->op == MINUS && quotient(r) && same_value(l, r->left->left)) {
-        NODE* c = r->right;
-        erase_tree(r->left);
-        erase_node(r);
-        return simp_node(to_binary(t, MOD, l, c), loop);
-    }
-    if (t->op != PLUS) return nullptr;
-    if (quotient(r)) std::swap(l, r);
-    if (!quotient(l) || !is_node_with_icon(r, MOD) || r->right->u.lval != l->right->u.lval ||
-        !same_value(r->left, l->left->left))
-        return nullptr;
-    return keep_term(t, r, true, false, loop);
-}
-
-// (x & c1) + (x & c2) of masks without a common bit is x & (c1 | c2).
-NODE* sum_of_masked(NODE* t, struct LOOP* loop) {
-    NODE *l = t->left, *r = t->right;
-    if (t->op != PLUS || !is_node_with_icon(l, ANDB) || !is_node_with_icon(r, ANDB) || !is_pure(l->left) ||
-        (bits_of(l->right) & bits_of(r->right)) != 0 || !same_value(l->left, r->left))
-        return nullptr;
-    set_icon(l->right, l->right->u.lval | r->right->u.lval);
-    return simp_node(only_left(t), loop);
-}
-
-const RULE sum_rules[] = {drop_zero,        canonical_constant, join_constants,      constant_minus_sum,
-                          remove_negations, cancel_terms,       constant_outward,    join_distant_constants,
-                          join_equal_terms, factor_out,         sum_with_complement, sum_of_bits,
-                          sum_of_masked,    remainder};
+const RULE sum_rules[] = {drop_zero,  canonical_constant, join_constants,   constant_minus_sum,     remove_negations,
+                          cancel,     by_pattern,         constant_outward, join_distant_constants, join_equal_terms,
+                          factor_out, sum_with_complement};
 
 NODE* simp_integer_sum(NODE* t, struct LOOP* loop) {
     if (!operands_have_type(t)) return t;

@@ -2,6 +2,7 @@
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/patterns.h"
 
 #include <cmath>
 #include <cstring>
@@ -35,6 +36,15 @@ NODE* address_of(NODE* object) {
 NODE* cast_to(TYPE* type, NODE* tree) {
     if (same_scalars(tree->type, type) && tree->op != STDOT && tree->op != STREF) return tree;
     return unary(type->is_pointer() ? PCONV : SCONV, tree, type);
+}
+
+const char* extremum_name(TYPE* type, bool maximum) {
+    return type == tp->int_t      ? (maximum ? "__max" : "__min")
+           : type == tp->long_t   ? (maximum ? "__lmax" : "__lmin")
+           : type == tp->llong_t  ? (maximum ? "__llmax" : "__llmin")
+           : type == tp->float_t  ? (maximum ? "__fmax" : "__fmin")
+           : type == tp->double_t ? (maximum ? "__fmax64" : "__fmin64")
+                                  : nullptr;
 }
 
 GENERATOR::GENERATOR(uint64_t seed, const GENERATOR_OPTIONS& o) : random(seed), w(world()), options(o) {
@@ -253,12 +263,7 @@ NODE* GENERATOR::choice_by_value(TYPE* type, int depth) {
 NODE* GENERATOR::extremum(TYPE* type, int depth) {
     const bool maximum = random.pick(2) != 0;
     if (type == tp->int_t && random.one_in(6)) return mk_ICALL("__abs16_sat", operand(type, depth), type);
-    const char* name = type == tp->int_t      ? (maximum ? "__max" : "__min")
-                       : type == tp->long_t   ? (maximum ? "__lmax" : "__lmin")
-                       : type == tp->llong_t  ? (maximum ? "__llmax" : "__llmin")
-                       : type == tp->float_t  ? (maximum ? "__fmax" : "__fmin")
-                       : type == tp->double_t ? (maximum ? "__fmax64" : "__fmin64")
-                                              : nullptr;
+    const char* name = extremum_name(type, maximum);
     if (!name) return nullptr;
     NODE *a = operand(type, depth), *b = random.one_in(2) ? constant(type) : operand(type, depth);
     if (random.one_in(3)) std::swap(a, b);
@@ -354,6 +359,7 @@ NODE* GENERATOR::truth(int depth) {
 }
 
 NODE* GENERATOR::integer_operator(TYPE* type, int depth) {
+    if (random.one_in(7)) return shape(type, depth, random.pick(static_cast<unsigned>(rules::all_patterns().size())));
     static const int ops[] = {PLUS, PLUS, MINUS, MINUS, MULT, DIV, MOD, ANDB, ANDB, ORB, XORB};
     NODE* a = operand(type, depth);
     switch (random.pick(9)) {

@@ -50,12 +50,14 @@ public:
     NODE* tree();                       // of a random type
     NODE* value(TYPE* type, int depth); // of exactly this type
     NODE* constant(TYPE* type);
+    NODE* shape(TYPE* type, int depth, std::size_t pattern); // the left side of a rewrite by pattern
     NODE* given(); // a condition on a favourite variable or on a tree of such, without effects
     SYMTAB* favourite() { return random.of(favourites); }
     INT65 number(TYPE* type); // within the type, most often near a boundary or a power of two
     RANDOM random;
 
 private:
+    friend class SHAPE;
     TYPE* integer_type();
     TYPE* arithmetic_type();
     NODE* leaf(TYPE* type);
@@ -91,6 +93,9 @@ private:
     std::vector<INT65> numbers;
     std::vector<NODE*> seen; // copies of subtrees, owned
 };
+
+// The target's function that gives the smaller or the larger of two values of the type, or null.
+const char* extremum_name(TYPE* type, bool maximum);
 
 NODE* cast_to(TYPE* type, NODE* tree); // SCONV or PCONV where the types differ
 

@@ -4,6 +4,7 @@
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 
@@ -91,7 +92,8 @@ TEST(RandomTrees, PairsOfOperatorsWithBoundaries) {
     auto is_shift = [](int op) { return op == SLL || op == SRL; };
     auto simplifies = [](NODE* t) {
         const FINDING f = TRIAL(t, 1, 8).check(operations[0]);
-        EXPECT_FALSE(f) << f.what << "\n  tree   " << f.before << "\n  result " << f.after << "\n  with   " << f.contents;
+        EXPECT_FALSE(f) << f.what << "\n  tree   " << f.before << "\n  result " << f.after << "\n  with   "
+                        << f.contents;
         erase_tree(t);
     };
     for (SYMTAB* x : world().integers) {
@@ -140,6 +142,42 @@ TEST(RandomTrees, ChosenPlacesStayPlaces) {
     expect_kept(maketree(PLUSASG, place(), constant(5, tp->int_t), tp->int_t));
     expect_kept(maketree(UAND, place(), nullptr, pointer));
     expect_kept(place());
+}
+
+// ---- Rows of patterns
+bool has_operands(const rules::TERM* t) {
+    if (!t || t->kind != rules::TERM::OPERATOR) return t && t->kind == rules::TERM::OPERAND;
+    return has_operands(t->left) || has_operands(t->right) || has_operands(t->third);
+}
+
+// What the executor's count of operations makes of a side; what constants compute is one.
+int cost(const rules::TERM* t) {
+    if (!t || t->kind != rules::TERM::OPERATOR || !has_operands(t)) return 0;
+    const int own = t->op == DIV || t->op == MOD ? 16 : t->op == SCONV ? 0 : 1;
+    return own + cost(t->left) + cost(t->right) + cost(t->third);
+}
+
+// Each row applies to trees made from its own left side, keeps their values, and costs no more than they do.
+TEST(RandomTrees, RowsOfPatternsApplyAndKeepValues) {
+    world();
+    std::vector<uint64_t> hits(static_cast<std::size_t>(rules::pattern_rows()));
+    rules::pattern_hits = hits.data();
+    const std::vector<rules::PATTERN>& all = rules::all_patterns();
+    TYPE* const types[] = {tp->int_t, tp->uint_t, tp->long_t, tp->ullong_t};
+    for (std::size_t i = 0; i < all.size(); ++i) {
+        EXPECT_LE(cost(all[i].right), cost(all[i].left)) << rules::pattern_row_text(all[i].row);
+        GENERATOR_OPTIONS plain;
+        plain.effects = false;
+        const uint64_t& hit = hits[static_cast<std::size_t>(all[i].row)];
+        const uint64_t before = hit;
+        for (uint64_t seed = 0; hit == before && seed < 4000; ++seed) {
+            GENERATOR make(seed, plain);
+            expect_kept(insert_mandatory_casts(make.shape(types[seed % 4], 0, i)));
+        }
+    }
+    for (std::size_t row = 0; row < hits.size(); ++row)
+        EXPECT_GT(hits[row], 0u) << rules::pattern_row_text(static_cast<int>(row));
+    rules::pattern_hits = nullptr;
 }
 
 // What only one arm of an inner conditional may compute is not computed for both.

@@ -56,19 +56,6 @@ static void copies(void) {
     for (i = 0; i < 6; i++) put_u32(taken[i]);
 }
 
-static void masks(void) {
-    long v = shared;
-    v &= 0xFFFFL;
-    shared = v | (shared & ~0xFFFFL) << 0;
-    put_i32(shared);
-    shared |= 0x8000;
-    put_i16(low_half(&shared));
-    ((unsigned*)&shared)[0] ^= 0xFFFF;
-    put_i32(shared);
-    shared += 0x10000L;
-    put_i16(high_half(&shared));
-}
-
 int main(void) {
     union words w;
     long local = 0x00010002L;
@@ -88,6 +75,5 @@ int main(void) {
     put_i32(w.l);
     quads();
     copies();
-    masks();
     return 0;
 }

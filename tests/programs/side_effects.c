@@ -20,10 +20,6 @@ static int deep(int a, int b, int c) {
     return (note(0, a) && (note(1, b) || note(2, c))) || (!note(3, a) && note(4, c));
 }
 
-static int select(int a, int b) {
-    return note(0, a) ? note(1, b) ? note(2, 10) : note(3, 20) : (note(4, 0), note(5, 30));
-}
-
 static long widths(void) {
     signed char c = 5;
     unsigned u = 65535u;
@@ -71,20 +67,12 @@ static int compound(void) {
     return x + i;
 }
 
-static int loop_effects(int n) {
-    int s = 0;
-    while (n-- && note(n, s < 12)) s += n ? n : note(9, 1);
-    return s;
-}
-
 int main(void) {
     int i, a[3] = {9, 9, 9};
     for (i = 0; i < 8; i++) show(deep(i & 4, i & 2, i & 1));
-    for (i = 0; i < 4; i++) show(select(i & 2, i & 1));
     put_i32(widths());
     put_i16(pointers());
     put_i16(compound());
-    for (i = 0; i < 8; i += 2) show(loop_effects(i));
     i = (a[0] = a[1] = 4) + a[2];
     put_i16(i);
     i = note(0, 3) * 0;

@@ -8,10 +8,6 @@ struct box {
     struct point low, high;
     long weight;
 };
-struct vector {
-    int n;
-    int v[6];
-};
 struct mixed {
     char tag;
     float f;
@@ -44,22 +40,6 @@ static int inside(struct box b, struct point p) {
     return p.x >= b.low.x && p.x <= b.high.x && p.y >= b.low.y && p.y <= b.high.y;
 }
 
-static struct vector doubled(struct vector v) {
-    int i;
-    for (i = 0; i < v.n; i++) v.v[i] *= 2;
-    return v;
-}
-
-static struct vector drop_first(struct vector v) {
-    struct vector r = {0, {0}};
-    int i;
-    if (v.n == 0) return v;
-    for (i = 1; i < v.n; i++) r.v[r.n++] = v.v[i];
-    return r;
-}
-
-static long total(struct vector v) { return v.n == 0 ? 0L : v.v[0] + 10L * total(drop_first(v)); }
-
 static struct mixed change(struct mixed m, int how) {
     if (how & 1) m.tag = (char)(m.tag + 1);
     if (how & 2) m.f *= 2.0F;
@@ -78,7 +58,6 @@ static struct point* next(void) {
 int main(void) {
     struct point p = make(3, -4), q = p, r;
     struct box b;
-    struct vector v = {4, {1, 2, 3, 4, 0, 0}}, w;
     struct mixed m = {'a', 1.5F, 1LL << 40, 9}, n;
     int i;
     q.x = 100;
@@ -92,12 +71,6 @@ int main(void) {
     put_i16(inside(b, make(0, 21)));
     b.low = b.high;
     put_i16(inside(b, b.high));
-    w = doubled(v);
-    put_i32(total(v));
-    put_i32(total(w));
-    v = doubled(drop_first(w));
-    put_i16(v.n);
-    put_i32(total(v));
     for (i = 0; i < 16; i += 3) {
         n = change(m, i);
         put_i16(n.tag);

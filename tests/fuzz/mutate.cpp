@@ -5,6 +5,7 @@
 //   icmutate SEED IN OUT    the same seed makes the same file
 #include "tools/model/ic_model.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <random>
 
@@ -128,31 +129,11 @@ private:
         t->mk_field(1, any(list), structure);
     }
 
-    static bool same_payload(int a, int b) {
-        auto has_payload = [](int op) {
-            switch (op) {
-            case 1:
-            case 2:
-            case 3:
-            case 4:
-            case 5:
-            case 25:
-            case 26:
-            case 40:
-            case 70:
-            case 72:
-            case 110:
-            case 115:
-            case 119:
-            case 129:
-            case 130:
-            case 132:
-            case 133:
-            case 163: return true;
-            default: return false;
-            }
-        };
-        return !has_payload(a) && !has_payload(b);
+    static bool has_payload(int op) {
+        using namespace if_op;
+        static constexpr int with[] = {LABEL, NAME, SCON, ICON,   FCON,  LCON,   FIELD, SWITCH, CALL,
+                                       UCALL, EPVAL, SKIP, DDNODE, ICALL, UICALL, MCALL, UMCALL, VREG};
+        return std::count(std::begin(with), std::end(with), op) != 0;
     }
 
     void give_operator(IC_NODE* t, int op) {
@@ -163,7 +144,7 @@ private:
         if (count >= 2 && !t->right) t->right = any_tree();
         const int before = t->op;
         t->op = op;
-        if (!same_payload(before, op)) fill(t);
+        if (has_payload(before) || has_payload(op)) fill(t);
     }
 
     void change_operator(IC_NODE* t) {
@@ -196,12 +177,10 @@ private:
                 t->number = any_number();
             if (t->op == 3) fill(t);
             return;
-        default: return fill_where_it_has(t);
+        default:
+            if (has_payload(t->op)) fill(t);
+            return;
         }
-    }
-
-    void fill_where_it_has(IC_NODE* t) {
-        if (!same_payload(t->op, 0)) fill(t);
     }
 
     // ---- Types, in place: the types made of them keep their sizes, as in a file that somebody put together

@@ -258,21 +258,3 @@ TEST(Fpsim, Representation) {
     simul_fval corrupt = {{0, 0, 0, 0, 0, 1}, 16, 0};
     EXPECT_EXIT(f_left_justify(&corrupt), testing::ExitedWithCode(1), "Illegal float representation!");
 }
-
-TEST(Fpsim, TruncationFollowsTheSizeOfTheType) {
-    TYPE_PKG pkg;
-    TYPE_PKG::abi = 0; // double is 32 bits wide
-    TYPE_PKG::init_type_pkg(&pkg);
-    struct {
-        TYPE* t;
-        bool single;
-    } const rows[] = {
-        {pkg.float_t, true}, {pkg.double_t, true}, {pkg.ldouble_t, false}, {pkg.mk_complex(pkg.float_t), true}};
-    for (auto& r : rows) {
-        simul_fval x;
-        f_atof("0.1", &x);
-        truncate_fval_to_target(&x, r.t);
-        simul_fval want = r.single ? simf(0.1f) : sim(0.1);
-        EXPECT_TRUE(f_bit_eq(&x, &want)) << r.t->printstr();
-    }
-}

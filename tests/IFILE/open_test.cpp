@@ -21,15 +21,6 @@ TEST(open, header_fields_reach_the_client) {
     EXPECT_EQ(world.unit.option_sets[1].id, 300u);
 }
 
-TEST(open, a_file_that_starts_inside_a_stream) {
-    WORLD world;
-    std::string bytes = "prefix" + FILE_BUILDER().build();
-    FILE* stream = fmemopen(bytes.data(), bytes.size(), "rb");
-    std::fseek(stream, 6, SEEK_SET);
-    world.unit.read(stream, &world.pkg);
-    EXPECT_EQ(world.unit.functions.size(), 1u);
-}
-
 TEST(open, refused_headers) {
     FILE_BUILDER magic, cpu, longer;
     magic.magic = "!<ocode>\n";
@@ -84,17 +75,4 @@ TEST(open, a_client_may_refuse) {
     EXPECT_EQ(why, "the header is refused");
 }
 
-TEST(open, the_basic_form_reads_the_header_alone) {
-    WORLD world;
-    FILE_BUILDER builder;
-    builder.options = rec(IFR_OPTION_SET, un(1) + un(0));
-    std::string bytes = builder.build();
-    I_FILE* file = I_FILE::if_open_basic(fmemopen(bytes.data(), bytes.size(), "rb"), &world.unit);
-    ASSERT_NE(file, nullptr);
-    EXPECT_EQ(world.unit.source, "");
-    EXPECT_TRUE(world.unit.option_sets.empty());
-    EXPECT_EQ(file->source_name, "t.c");
-    EXPECT_EQ(file->find_typeref(1), nullptr); // no type package yet
-    EXPECT_EQ(I_FILE::if_close(file, false, false), 0);
-}
 } // namespace

@@ -89,36 +89,6 @@ TEST(primitives, positions) {
                          rec(IFR_END_LOCALS, by({2, 1, 1})) + rec(IFR_END_LOCALS, by({1, 4, 5})));
 }
 
-TEST(primitives, levels_follow_the_brackets) {
-    WORLD world;
-    IC_SYMBOL sym;
-    sym.index = 0;
-    written(world, [&](I_FILE& f) {
-        std::vector<int64_t> levels;
-        auto note = [&] { levels.push_back(f.level); };
-        f.if_write_begin_func(&sym, nullptr), note();
-        f.if_write_end_args(nullptr), note();
-        f.if_write_begin_block(nullptr), note();
-        f.if_write_end_locals(nullptr), note();
-        f.if_write_end_block(nullptr), note();
-        f.if_write_end_func(nullptr), note();
-        EXPECT_EQ(levels, (std::vector<int64_t>{1, 2, 3, 3, 2, 0}));
-    });
-    EXPECT_GT(sym.location, 0u);
-}
-
-TEST(primitives, a_discarded_output_has_no_sections) {
-    WORLD world;
-    char* bytes = nullptr;
-    size_t size = 0;
-    I_FILE* file = I_FILE::if_create(open_memstream(&bytes, &size), &world.pkg, "t.c");
-    PSN psn{"a.c", 1, 1};
-    file->if_write_end_locals(&psn);
-    EXPECT_EQ(I_FILE::if_close(file, true, true), 0);
-    EXPECT_EQ(std::string(bytes + 16, 20), std::string(20, '\0'));
-    std::free(bytes);
-}
-
 TEST(primitives, a_stream_that_fails_is_reported_at_the_end) {
     WORLD world;
     FILE* full = std::fopen("/dev/full", "wb");

@@ -126,19 +126,6 @@ TEST(types, a_class_with_every_list) {
     EXPECT_TRUE(TYPE_PKG::seen_bitfield);
 }
 
-TEST(types, recursive_structures) {
-    FILE_BUILDER file;
-    std::string rest = by({0, 0, 0, 0, 0, 0, 0, 0});
-    file.types += type_rec(3, 24, by({0}) + str("S") + by({1, 0, 32, 32, 1, 0, 0, 0})) +
-                  type_rec(4, 24, by({1}) + str("U") + by({1, 0, 32, 32, 1, 0, 0, 0})) +
-                  type_rec(5, 15, by({3, 32, 32})) + type_rec(6, 15, by({4, 32, 32})) +
-                  list(3, 7, mdata(3, 1, "u", 6, rest)) + list(4, 7, mdata(4, 1, "s", 5, rest));
-    TWICE t(file, {3});
-    const TYPE* u = t[3]->mdata()->type->type_pointed_to();
-    EXPECT_TRUE(u->is_union());
-    EXPECT_EQ(u->mdata()->type->type_pointed_to(), t[3]);
-}
-
 // What each version's records hold beside the newest form's.
 TEST(types, forms_by_version) {
     for (int version = -86; version <= -71; version++) {

@@ -219,20 +219,6 @@ TEST(OptionExport, RoundTripsEveryOption) {
     EXPECT_GT(seen, 66 + 30);
 }
 
-TEST(OptionTables, ItemValuesAndFormsAreDistinct) {
-    std::set<int> values;
-    std::set<std::string> forms;
-    for (int id = 0; id < O::OPTION_COUNT; ++id) {
-        for (const auto* item = O::option_definitions[id].items; item && item->word; ++item)
-            EXPECT_TRUE(values.insert(item->value).second) << item->word;
-        for (const char* form : O::option_definitions[id].forms) {
-            if (!form) break;
-            EXPECT_TRUE(forms.insert(form).second) << form;
-        }
-    }
-    EXPECT_EQ(values.size(), 50u);
-}
-
 TEST(OptionConflicts, LaterOptionWins) {
     const WORDS cases[] = {
         {{"-h1", "-h0"}, "--std_lib_func_redefined"},   {{"-h0", "-h2"}, "--std_lib_func_not_defined"},

@@ -34,13 +34,6 @@ TEST_F(Types, DroppedFunctionKeepsItsDependents) {
     EXPECT_EQ(std::count(order.begin(), order.end(), first), 1);
 }
 
-TEST_F(Types, MembersAreNumberedWhenTheTypeIsClosed) {
-    TYPE* s = self_referring("L");
-    EXPECT_EQ(s->mdata()->ordinal, 1u);
-    EXPECT_EQ(s->mdata()->next->ordinal, 2u);
-    EXPECT_EQ(s->mdata()->type->type_pointed_to(), s);
-}
-
 TEST_F(Types, Compatibility) {
     TYPE* s = structure("S", member("a", pkg.long_t, 0));
     TYPE* other = structure("S", member("b", pkg.float_t, 0));
@@ -138,23 +131,6 @@ TEST_F(Types, MergeOfDeclarationAndDefinition) {
     EXPECT_EQ(find_type(decl), def);
     // The definition is newer here: it would be lost.
     EXPECT_FALSE(find_equivalent_type(structure("T", member("a", pkg.long_t, 0))));
-}
-
-TEST_F(Types, MarkingReachesEverythingWritten) {
-    TYPE* s = self_referring("L");
-    TYPE* named = pkg.mk_typedef("N", false, pkg.llong_t, 64, 32, false);
-    TYPE* f = function(pkg.mk_ptr(s), param(pkg.mk_array(named, false, 2, true)));
-    TYPE* alone = structure("Alone", nullptr);
-    f->refd = true;
-    TYPE::mark_refed_types(TYPE_PKG::root_type);
-    for (TYPE* t : {s, named, pkg.llong_t, pkg.int_t, pkg.mk_ptr(s)}) EXPECT_TRUE(t->refd) << t->printstr();
-    EXPECT_FALSE(alone->refd);
-    EXPECT_FALSE(pkg.float_t->refd);
-    TYPE::mark_named_types(TYPE_PKG::root_type, false);
-    EXPECT_FALSE(alone->refd);
-    TYPE::mark_named_types(TYPE_PKG::root_type, true);
-    EXPECT_TRUE(alone->refd);
-    EXPECT_FALSE(pkg.float_t->refd);
 }
 
 TEST_F(Types, StructureInItself) {

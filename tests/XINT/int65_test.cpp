@@ -194,15 +194,3 @@ TEST_F(Int65, Text) {
     int slot = 0;
     for (auto& r : rows) EXPECT_STREQ(int2text(r.v, r.t, r.radix, slot++), r.text);
 }
-
-TEST_F(Int65, Narrowing) {
-    EXPECT_TRUE(INT65(255).fits<uint8_t>());
-    EXPECT_FALSE(INT65(256).fits<uint8_t>());
-    EXPECT_FALSE(INT65(-1).fits<uint64_t>());
-    EXPECT_FALSE(INT65(0, ~uint64_t{0}).fits<int64_t>());
-    EXPECT_TRUE(INT65(INT64_MIN).fits<int64_t>());
-    EXPECT_FALSE(INT65(-1, 0).fits<int64_t>());
-    EXPECT_FALSE(INT65(1, 0).fits<uint64_t>());
-    EXPECT_EXIT(INT65(256).fits_in<uint8_t>(), testing::ExitedWithCode(1), "");
-    EXPECT_EXIT(INT65(1) / INT65(0), testing::ExitedWithCode(1), "");
-}

@@ -159,15 +159,4 @@ TEST_F(Effects, Alignment) {
     EXPECT_EQ(lvalue_alignment(keep(member(name(s), 1)), nullptr), 32u);
 }
 
-TEST_F(Effects, WhatAPointerIsComputedFrom) {
-    SYMTAB *p = local("p", ptr(tp->int_t)), *a = local("a", array(tp->int_t, 4)), *i = local("i");
-    analyze();
-    EXPECT_EQ(pointer_basis(keep(sum(maketree(PCONV, name(p), nullptr, ptr(tp->long_t)), name(i))))->u.sym, p);
-    EXPECT_EQ(address_expr_base(keep(sum(start_of(a), name(i))))->u.sym, a);
-    EXPECT_EQ(address_expr_base(keep(address(deref(sum(name(p), name(i))))))->u.sym, p);
-    NODE* arms = maketree(COLON, name(p), name(p), ptr(tp->int_t));
-    EXPECT_EQ(pointer_basis(keep(maketree(QUEST, name(i), arms, ptr(tp->int_t)))), nullptr);
-    EXPECT_EQ(pointer_basis(keep(maketree(PCONV, name(i), nullptr, ptr(tp->int_t)))), nullptr);
-}
-
 } // namespace

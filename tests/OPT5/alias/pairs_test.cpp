@@ -52,17 +52,6 @@ TEST_F(Pairs, ElementsOfArrays) {
     expect_apart(at(wide, icon(2)), at(wide, icon(4)));
 }
 
-TEST_F(Pairs, MembersOfElements) {
-    SYMTAB *s = local("s", array(pair(), 8)), *i = local("i"), *j = local("j"), *p = parameter("p", ptr(pair()));
-    analyze();
-    auto element = [&](SYMTAB* index) { return deref(sum(start_of(s), times(name(index), 4))); };
-    expect_apart(member(element(i), 0), member(element(j), 1));
-    expect_meet(member(element(i), 1), member(element(j), 1));
-    expect_apart(member(name(p), 0, STREF), member(name(p), 1, STREF));
-    expect_apart(member(deref(name(p)), 0), member(name(p), 1, STREF));
-    expect_meet(member(deref(name(p)), 1), member(name(p), 1, STREF));
-}
-
 TEST_F(Pairs, AnObjectWithoutAnAddressIsReachedByNoPointer) {
     SYMTAB *hidden = local("h"), *shown = local("s"), *q = local("q", ptr(tp->int_t));
     SYMTAB *kept = global("k", tp->int_t, SC_STATIC, CQ_REFERENCED), *given = global("g", tp->int_t);

@@ -106,17 +106,6 @@ TEST(Files, InfoFileByLevel) {
     }
 }
 
-TEST(Files, OutputIsTheSameWhateverIsLogged) {
-    WORKPLACE w;
-    w.put("a.if", unit());
-    for (const char* level : {"off", "0", "1", "2", "3", "4"}) {
-        const std::string option = std::string("--opt_level=") + level;
-        EXPECT_EQ(w.run({option, "a.if", "b.if"}).status, 0) << level;
-        EXPECT_EQ(w.run({option, "b.if", "c.if"}).status, 0) << "its own output is input again at " << level;
-        EXPECT_GT(w.get("c.if").size(), 100u);
-    }
-}
-
 TEST(Files, UnitWithoutFunctions) {
     WORKPLACE w;
     w.put("a.if", unit({}, 0));
@@ -174,14 +163,6 @@ TEST(Files, OutputUnderOtherNames) {
     w.put("out.if", r.out);
     EXPECT_EQ(w.run({"out.if", "b.if"}).status, 0) << "nothing that the run prints stands in it";
     EXPECT_TRUE(contains(r.err, "Pass 2")) << r.err;
-}
-
-TEST(Files, DebugNameIsCut) {
-    WORKPLACE w;
-    const std::string name(251, 'n');
-    w.put(name, unit());
-    EXPECT_EQ(w.run({"-#1", name, "b.if"}).status, 0);
-    EXPECT_TRUE(w.has(name.substr(0, 250) + ".odb"));
 }
 
 TEST(Files, SplitDebugFiles) {

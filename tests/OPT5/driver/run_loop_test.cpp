@@ -58,23 +58,6 @@ protected:
     static void add_barrier(void (*action)()) { permuted_order.push_back(new barrier_pass("barrier", action)); }
 };
 
-TEST_F(RunLoop, BarriersWaitForAllFunctions) {
-    add(step_1);
-    add_barrier(barrier_1);
-    add(step_2);
-    add(step_3);
-    run_functions(write_function);
-    EXPECT_EQ(trace, "1a 1b 1c B1 2a 3a Wa 2b 3b Wb 2c 3c Wc");
-    EXPECT_EQ(currfunc, nullptr);
-}
-
-TEST_F(RunLoop, SuppressedFunctionIsNotWritten) {
-    add_barrier(put_c_to_sleep);
-    add(step_3);
-    run_functions(write_function);
-    EXPECT_EQ(trace, "S 3a Wa 3b Wb");
-}
-
 TEST_F(RunLoop, UnsuppressedFunctionTakesPartInTheNextBarrier) {
     add_barrier(put_c_to_sleep);
     add(step_2);

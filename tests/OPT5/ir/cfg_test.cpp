@@ -38,67 +38,6 @@ TEST_F(CfgTest, ASwitchWithoutDefaultFallsThroughExplicitly) {
     EXPECT_TRUE(valid());
 }
 
-TEST_F(CfgTest, ASwitchBeforeALabelUsesTheLabelAsDefault) {
-    SYMTAB* x = local("x");
-    add(maketree(SWITCH, mk_NAME(x), maketree(CASE, mk_ICON(INT65(1), tp->int_t), ref(2), tp->int_t), tp->int_t));
-    define(1);
-    assign(x, 1);
-    define(2);
-    ret(x);
-    build();
-    EXPECT_TRUE(has_edge(currfuninfo->bb_list, block_of(1)));
-    EXPECT_TRUE(has_edge(currfuninfo->bb_list, block_of(2)));
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(CfgTest, EqualTargetsMakeOneEdge) {
-    SYMTAB* x = local("x");
-    branch_if(x, 1, 1);
-    define(1);
-    ret(x);
-    build();
-    EXPECT_EQ(edge_length(currfuninfo->bb_list->successors), 1);
-    EXPECT_EQ(edge_length(block_of(1)->predecessors), 1);
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(CfgTest, UnreachableBlocksAndTheirLabelsDisappear) {
-    SYMTAB* x = local("x");
-    go(3);
-    define(1);
-    assign(x, 1);
-    define(2);
-    go(1);
-    define(3);
-    ret(x);
-    build();
-    EXPECT_EQ(block_of(1), nullptr);
-    EXPECT_EQ(block_of(2), nullptr);
-    EXPECT_NE(block_of(3), nullptr);
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(CfgTest, NumbersAreReversePostorderAndListOrder) {
-    SYMTAB* x = local("x");
-    branch_if(x, 1, 2);
-    define(1);
-    assign(x, 1);
-    go(3);
-    define(2);
-    assign(x, 2);
-    define(3);
-    ret(x);
-    build();
-    int n = 0;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        EXPECT_EQ(bb->dfn, ++n);
-        for (const EDGE* e = bb->successors; e; e = e->rest) EXPECT_GT(e->first->dfn, bb->dfn) << "no loop: edges go forward";
-    }
-    EXPECT_EQ(n, currfuninfo->bb_count);
-    EXPECT_EQ(currfuninfo->bb_list->rdflink->dfn, n);
-    EXPECT_TRUE(valid());
-}
-
 TEST_F(CfgTest, SplittingEveryCriticalEdgeLeavesNone) {
     SYMTAB* x = local("x");
     define(1);
@@ -164,27 +103,6 @@ TEST_F(CfgTest, ValidationFindsAndMendsMissingEdges) {
     EXPECT_TRUE(valid());
 }
 
-TEST_F(CfgTest, AWideSwitchBuildsInLinearTime) {
-    constexpr int N = 20000;
-    SYMTAB* x = local("x");
-    NODE* cases = nullptr;
-    for (int i = 1; i <= N; ++i) {
-        NODE* c = maketree(CASE, mk_ICON(INT65(i), tp->int_t), ref(i), tp->int_t);
-        cases = cases ? maketree(COMMA, cases, c, tp->int_t) : c;
-    }
-    add(maketree(SWITCH, mk_NAME(x), maketree(COMMA, cases, maketree(DEFAULT, ref(1), nullptr, tp->int_t), tp->int_t), tp->int_t));
-    for (int i = 1; i <= N; ++i) {
-        define(i);
-        assign(x, i);
-        go(N + 1);
-    }
-    define(N + 1);
-    ret(x);
-    build();
-    EXPECT_EQ(currfuninfo->bb_count, N + 2);
-    EXPECT_EQ(edge_length(block_of(N + 1)->predecessors), N);
-}
-
 // ---- Dominators
 
 class DominatorTest : public FunctionTest {
@@ -224,19 +142,6 @@ TEST_F(DominatorTest, DiamondInALoop) {
     EXPECT_EQ(d().immediate_post_dominator(b1), b4);
     EXPECT_TRUE(d().post_dominates(b5, b1));
     EXPECT_EQ(d().immediate_post_dominator(b5), nullptr);
-}
-
-TEST_F(DominatorTest, SeveralReturnsHaveNoCommonPostDominator) {
-    SYMTAB* x = local("x");
-    branch_if(x, 1, 2);
-    define(1);
-    ret(x);
-    define(2);
-    ret(x);
-    build();
-    compute_dominators(false);
-    EXPECT_EQ(d().immediate_post_dominator(currfuninfo->bb_list), nullptr);
-    EXPECT_FALSE(d().post_dominates(block_of(1), currfuninfo->bb_list));
 }
 
 TEST_F(DominatorTest, AnEditMakesTheNextQueryRebuild) {

@@ -61,15 +61,6 @@ TEST_F(SymbolTest, DeclarationsFindTheirDefinition) {
     EXPECT_EQ(get_sym_def_for_decl(late_decl), late_def);
 }
 
-TEST_F(SymbolTest, NamePrefixFollowsTheAbi) {
-    EXPECT_STREQ(skip_name_prefix("_main"), "main");
-    EXPECT_STREQ(skip_name_prefix(".main"), "main");
-    EXPECT_STREQ(skip_name_prefix("__f"), "_f");
-    TYPE_PKG::abi = 1;
-    EXPECT_STREQ(skip_name_prefix("_main"), "_main");
-    TYPE_PKG::abi = 0;
-}
-
 // ---- Initial values
 
 class AutoinitTest : public SymbolTest {

@@ -100,38 +100,6 @@ TEST_F(FcpTest, WhatRestrictSaysStaysWithItsVariable) {
     EXPECT_FALSE(says("fixed")) << text();
 }
 
-TEST_F(FcpTest, PropagableValues) {
-    SYMTAB *x = local("x"), *s = local("s", tp->mk_array(tp->int_t, false, 4, true));
-    NODE* string = new_node(SCON, tp->mk_ptr(tp->schar_t));
-    string->mk_scon("ab", 3);
-    auto cast = [](int op, NODE* t, TYPE* type) { return maketree(op, t, nullptr, type); };
-    TYPE* pointer = tp->mk_ptr(tp->int_t);
-    struct {
-        NODE* tree;
-        int uses;
-        bool expected;
-    } cases[] = {
-        {icon(3), 9, true},
-        {string, 1, true},
-        {copy_tree(string), 2, false},
-        {address(s), 2, true},
-        {maketree(PLUS, address(s), icon(2), pointer), 2, true},
-        {maketree(PLUS, address(s), mk_NAME(x), pointer), 2, false},
-        {maketree(UAND, maketree(UMULT, mk_NAME(x), nullptr, tp->int_t), nullptr, pointer), 2, false},
-        {cast(SCONV, icon(1), tp->long_t), 2, true},
-        {cast(SCONV, mk_NAME(x), tp->long_t), 2, false},
-        {cast(PCONV, icon(0), pointer), 2, true},
-        {cast(PCONV, icon(0x7000), pointer), 2, false},
-        {cast(PCONV, address(s), pointer), 2, true},
-        {mk_NAME(x), 2, false},
-        {maketree(PLUS, icon(1), icon(2), tp->int_t), 2, false},
-    };
-    for (const auto& c : cases) {
-        EXPECT_EQ(expr_is_propagable(c.tree, c.uses), c.expected) << tree_to_infix(c.tree);
-        erase_tree(c.tree);
-    }
-}
-
 TEST_F(FcpTest, GlobalsThatNeverChange) {
     struct {
         const char* name;

@@ -40,22 +40,6 @@ TEST_F(SimpcfgTest, ALoopThatDoesNothingStays) {
     EXPECT_TRUE(valid());
 }
 
-TEST_F(SimpcfgTest, ALongChainOfJumpsIsThreadedInOneGo) {
-    SYMTAB* x = local("x");
-    constexpr int N = 3000;
-    branch_if(x, 1, N + 1);
-    for (int n = 1; n <= N; ++n) {
-        define(n);
-        go(n + 1);
-    }
-    define(N + 1);
-    ret(x);
-    build();
-    simpcfg(false, false);
-    EXPECT_EQ(blocks(), 1);
-    EXPECT_TRUE(valid());
-}
-
 // Where a case ends up is a case itself, which gives way in its turn.
 TEST_F(SimpcfgTest, CasesAlongAChainOfJumpsAllReachItsEnd) {
     SYMTAB *x = local("x"), *y = local("y");
@@ -81,28 +65,6 @@ TEST_F(SimpcfgTest, CasesAlongAChainOfJumpsAllReachItsEnd) {
             EXPECT_EQ(ref->lbl->bblock, end) << "case " << n;
         }
     });
-    EXPECT_TRUE(valid());
-}
-
-TEST_F(SimpcfgTest, SplitBlockKeepsTheOrderAndTheEdges) {
-    SYMTAB* x = local("x");
-    assign(x, 1);
-    assign(x, 2);
-    branch_if(x, 1, 2);
-    define(1);
-    assign(x, 5);
-    define(2);
-    ret(x);
-    build();
-    BBLK* entry = currfuninfo->bb_list;
-    BBLK* rest = split_block(entry, entry->statements, true);
-    EXPECT_EQ(entry->branch()->op, BRANCH);
-    EXPECT_EQ(entry->dflink, rest);
-    EXPECT_EQ(rest->branch()->op, IF);
-    EXPECT_TRUE(has_edge(entry, rest));
-    EXPECT_TRUE(has_edge(rest, block_of(1)));
-    EXPECT_TRUE(has_edge(rest, block_of(2)));
-    EXPECT_EQ(currfuninfo->bb_count, rest->dfn + 2);
     EXPECT_TRUE(valid());
 }
 

@@ -248,28 +248,6 @@ TEST_F(Families, ChainsAreReassociated) {
     check(rows, [&](NODE* t) { return simp_assoc(t, nullptr); });
 }
 
-TEST_F(Families, OnlyTheBitsThatMatterAreComputed) {
-    struct CASE {
-        NODE* tree;
-        long mask;
-        const char* expected;
-    } cases[] = {
-        {bin(ANDB, x(), icon(255)), 15, "x"},
-        {bin(ANDB, x(), icon(7)), 15, "x & 7"},
-        {bin(ORB, x(), icon(16)), 15, "x"},
-        {bin(PLUS, bin(ANDB, x(), icon(255)), bin(ORB, y(), icon(256))), 15, "(int)((unsigned int)x + (unsigned int)y)"},
-        {bin(SRL, bin(ANDB, u(), icon(0xFF0, tp->uint_t)), icon(4), tp->uint_t), 15, "u >> 4"},
-        {bin(SRL, bin(ORB, x(), icon(-32768)), icon(4), tp->int_t), 0xF000, "(x | -32768) >> 4"}, // copies of the sign
-        {bin(DIV, bin(ANDB, x(), icon(255)), icon(3)), 1, "(x & 255) / 3"},
-    };
-    for (CASE& c : cases) {
-        const std::string before = show(c.tree);
-        c.tree = prop_mask_into_subtree(c.tree, INT65(c.mask));
-        EXPECT_EQ(show(c.tree), c.expected) << before;
-        erase_tree(c.tree);
-    }
-}
-
 TEST_F(Families, AddressesAndCopiesOfStructures) {
     SYMTAB *ss = symbol("s", sample_struct()), *sp = symbol("q", tp->mk_ptr(sample_struct()));
     const ROW rows[] = {

@@ -47,16 +47,6 @@ TEST_F(Target, SiliconVersions) {
     rtc_unified_memory = false;
 }
 
-TEST_F(Target, MemoryReferencesByKind) {
-    EXPECT_EQ(target_memref[tp->int_t->ekind()][0], 1);
-    EXPECT_EQ(target_memref[tp->ulong_t->ekind()][0], 2);
-    EXPECT_EQ(target_memref[tp->llong_t->ekind()][0], 4);
-    EXPECT_EQ(target_memref[tp->float_t->ekind()][0], 2);
-    EXPECT_EQ(target_memref[tp->double_t->ekind()][0], 0);
-    EXPECT_EQ(target_memref[tp->ldouble_t->ekind()][0], 4);
-    EXPECT_EQ(target_memref[tp->void_ptr_t->ekind()][0], 0);
-}
-
 TEST_F(Target, QuestionsAboutTrees) {
     EXPECT_TRUE(offset_is_in_range(INT65(32767), tp->int_t, 1));
     EXPECT_FALSE(offset_is_in_range(INT65(32768), tp->int_t, 1));
@@ -67,31 +57,6 @@ TEST_F(Target, QuestionsAboutTrees) {
     EXPECT_EQ(show(cpu_bit_test_subtree(bin(EQ, bin(ANDB, wide, icon(8, tp->long_t)), icon(0)))), "l & 8L");
     EXPECT_EQ(show(cpu_bit_test_subtree(bin(LE, copy_tree(x), icon(0)))), "x <= 0");
     EXPECT_EQ(cost_for_DIV_to_MULT_expr(bin(DIV, bin(PLUS, copy_tree(x), icon(1)), icon(3))), 670);
-}
-
-TEST_F(Target, PointersBehindBuiltins) {
-    SYMTAB* x = symbol("x", tp->int_t);
-    NODE* byte = mk_ICALL("__byte", args({address(name(x)), icon(1)}), tp->mk_ptr(tp->int_t));
-    EXPECT_EQ(show(byte), "&x");
-    EXPECT_EQ(object_name_if_known(deref(byte)), x);
-    EXPECT_EQ(object_name_if_known(deref(mk_ICALL("__other", args({address(name(x))}), byte->type))), nullptr);
-}
-
-TEST_F(Target, StackVariables) {
-    init_reg_defs();
-    SYMTAB *a = symbol("a", tp->int_t), *v = symbol("v", tp->mk_qual(tp->int_t, QUAL_VOLATILE)),
-           *s = symbol("s", sample_struct());
-    SYMTAB *parm = symbol("p", tp->int_t, 1, SC_AUTO), *aliased = symbol("q", tp->int_t);
-    SYMTAB* array = symbol("t", tp->mk_array(tp->int_t, false, 4, true));
-    aliased->set_is_aliased(true);
-    SYMTAB* all[] = {a, v, s, parm, aliased, array};
-    for (int i = 0; i < 5; ++i) all[i]->next = all[i + 1];
-    EXPECT_EQ(sort_stack_variables(a), a);
-    EXPECT_EQ(a->sclass, SC_REGISTER2);
-    EXPECT_EQ(a->value, 0u);
-    EXPECT_EQ(s->sclass, SC_REGISTER2);
-    EXPECT_EQ(s->value, 1u);
-    for (SYMTAB* other : {v, parm, aliased, array}) EXPECT_EQ(other->sclass, SC_AUTO) << other->name;
 }
 
 // Addresses of members become sums, and what stands in memory all the same stays.
@@ -154,21 +119,6 @@ TEST_F(Target, InstancesFollowVersionAndUnit) {
     start_as(27, 0);
     EXPECT_EQ(find_BIF_descriptor("__min"), nullptr);
     EXPECT_NE(find_BIF_descriptor("_enable_interrupts"), nullptr);
-}
-
-TEST_F(Target, SignaturesComeFromTheTable) {
-    BIF* bif = find_BIF_descriptor("__rpt_subcul");
-    ASSERT_EQ(bif->nparams, 4);
-    EXPECT_EQ(bif->return_type, tp->ulong_t);
-    EXPECT_EQ(get_BIF_parameter('A', bif)->type, tp->mk_ptr(tp->ulong_t));
-    EXPECT_EQ(get_BIF_parameter('c', bif)->type, tp->int_t);
-    // One symbol for one letter and type.
-    EXPECT_EQ(get_BIF_parameter('a', find_BIF_descriptor("__rol"))->u.sym,
-              get_BIF_parameter('a', find_BIF_descriptor("__ror"))->u.sym);
-    EXPECT_NE(get_BIF_parameter('a', find_BIF_descriptor("__rol"))->u.sym,
-              get_BIF_parameter('a', find_BIF_descriptor("__flip16"))->u.sym);
-    EXPECT_TRUE(find_BIF_descriptor("__rpt_mov_imm_far")->return_type->type_pointed_to()->qual_kind(false) & QUAL_FAR);
-    EXPECT_EQ(find_BIF_descriptor("_symval")->return_type, tp->ulong_t);
 }
 
 TEST_F(Target, ArgumentsTakeTheirParametersTypes) {

@@ -63,26 +63,6 @@ TEST_F(ExecTest, CountedLoopRunsOnceMoreThanItsCounter) {
     EXPECT_EQ(printed, "5\n");
 }
 
-TEST_F(ExecTest, DivisionByZeroIsReported) {
-    begin(main_sym);
-    IC_SYMBOL* x = local("x", pkg.int_t);
-    body();
-    statement(node(ASG, pkg.int_t, name(x), num(0, pkg.int_t)));
-    statement(node(DIV, pkg.int_t, num(1, pkg.int_t), name(x)));
-    end();
-    expect_error(EXEC_DIVISION, "division by zero");
-}
-
-TEST_F(ExecTest, BadAddressesAreReported) {
-    begin(main_sym);
-    IC_SYMBOL* p = local("p", pkg.mk_ptr(pkg.int_t));
-    body();
-    statement(node(ASG, p->type, name(p), num(0, p->type)));
-    statement(node(UMULT, pkg.int_t, name(p)));
-    end();
-    expect_error(EXEC_BAD_ADDRESS, "null pointer");
-}
-
 TEST_F(ExecTest, UnalignedObjectIsReported) {
     begin(main_sym);
     IC_SYMBOL* p = local("p", pkg.mk_ptr(pkg.long_t));
@@ -100,17 +80,6 @@ TEST_F(ExecTest, MissingFunctionIsReported) {
     statement(call(f, nullptr));
     end();
     expect_error(EXEC_MISSING, "nowhere");
-}
-
-TEST_F(ExecTest, EndlessLoopAndRecursionAreReported) {
-    begin(main_sym);
-    body();
-    file->if_write_label(1);
-    statement(node(BRANCH, pkg.int_t, label(1)));
-    end();
-    EXEC_OPTIONS options;
-    options.max_steps = 1000;
-    expect_error(EXEC_STEPS, "too many steps", options);
 }
 
 TEST_F(ExecTest, RecursionWithoutEndIsAStackOverflow) {

@@ -305,7 +305,7 @@ const ROW steps[] = {
     /* 74 */ {F, "subrange", nullptr, L1, [] { lcse_subrange_assignments(); elim_dead_subrange_assigns(); }, alias, graph},
     /* 75 */ {L, "lcp", nullptr, L1, [] { copyprop(1); }, none, none},
     /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, graph},
-    /* 77 */ {L, "lcse", nullptr, L1, lcse, none, none},
+    /* 77 */ {F, "lcse", nullptr, L1, lcse, alias, graph},
     /* 78 */ {L, "propagate increments", nullptr, L1, propagate_increments, none, none},
     /* 79 */ {L, "Disguise Vectors", nullptr, always, disguise_vector_operations, none, none},
     /* 80 */ {L, "late LIR", nullptr, always, late_LIR, none, none},

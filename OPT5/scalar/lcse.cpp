@@ -1,4 +1,617 @@
-// Not built yet: the passes leave the program as it is, and every question is answered with "not known".
+// Common subexpressions of a block, and of the chain of blocks that each lead to one that is entered from nowhere else.
+//
+// Values are numbered: two trees have one number where they surely give the same value (Alpern, Wegman and Zadeck,
+// Detecting Equality of Variables in Programs, 1988; here over a chain of blocks, which needs no fixpoint). A tree whose
+// number a variable has is replaced by that variable. Otherwise its occurrences are remembered, and once they would save
+// more than an assignment costs, the first of them is kept in a temporary ahead of its statement. A store gives the place
+// the number of what is stored, so that a load behind it finds that; a place that a compound assignment wrote is found the
+// same way. What is assigned to a variable that has its number already is dropped.
+//
+// Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph; symbols are split anew.
+// Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
+// forgotten where the place or its address may change. Trees without effects alone are numbered, in statements that
+// evaluate all of them ahead of their one effect: of `*p + f()` the load may come first or last. The first occurrence is
+// evaluated whenever its statement is, so that nothing is computed that was not. A chain ends where an exception may leave
+// a statement in its middle.
 #include "OPT5/scalar/lcse.h"
 
-void lcse() {}
+#include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/subrange.h"
+#include "OPT5/simp/seq.h"
+
+#include <boost/container_hash/hash.hpp>
+
+#include <algorithm>
+#include <cmath>
+#include <unordered_map>
+#include <vector>
+
+bool good_CSE_tree(const NODE* t, bool) {
+    if (!t->type->is_scalar() || t->type->is_complex()) return false;
+    switch (t->op) {
+    case OUIALIGN:
+    case NONALIGN:
+    case SCON:
+    case ICON:
+    case FCON:
+    case NAME: return false;
+    case PLUS:
+    case MINUS: // a constant displacement belongs to the access
+        return !(t->type->is_pointer() && t->right->op == ICON);
+    case UAND:
+    case ARGREF: return false; // a constant, or the sum below it
+    case SCONV: // a product of two of them is the short one, which one of variables would not be
+    case PCONV:
+    case ISP2CHAR: return false;
+    default: return true;
+    }
+}
+
+namespace {
+
+using VALUE = int; // a value's number; 0: none
+constexpr size_t MOST_LOADS = 32, MOST_HOLDERS = 4;
+constexpr int MOST_NODES = 64;               // of a tree that is worth looking for
+constexpr int COST_OF_DIVISION = 16;
+constexpr double COST_OF_ASSIGNMENT = 1;
+
+// Types that one representation serves: all pointers, integers by width and sign. 0: no such type.
+unsigned code_of(const TYPE* t) {
+    if (t->is_pointer()) return 1;
+    if (t->is_float() && !t->is_complex()) return 2 | t->size << 4;
+    if ((t->is_int() || t->is_enum()) && !t->is_bool()) return (t->is_unsigned() ? 3u : 4u) | t->size << 4;
+    return 0;
+}
+
+struct KEY {
+    int op;
+    unsigned code;
+    uint64_t payload;
+    VALUE a, b;
+    bool operator==(const KEY& o) const {
+        return op == o.op && code == o.code && payload == o.payload && a == o.a && b == o.b;
+    }
+};
+struct KEY_HASH {
+    size_t operator()(const KEY& k) const {
+        size_t h = 0;
+        boost::hash_combine(h, k.op);
+        boost::hash_combine(h, k.code);
+        boost::hash_combine(h, k.payload);
+        boost::hash_combine(h, k.a);
+        boost::hash_combine(h, k.b);
+        return h;
+    }
+};
+uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); } // compared alone
+
+bool is_computed(int op) {
+    switch (op) {
+    case PLUS:
+    case MINUS:
+    case MULT:
+    case DIV:
+    case MOD:
+    case ANDB:
+    case ORB:
+    case XORB:
+    case SLL:
+    case SRL:
+    case UMINUS:
+    case NOTB:
+    case ABS:
+    case EXCLAIM:
+    case SCONV:
+    case PCONV:
+    case PMCONV: return true;
+    default: return op_is_int_compare(op) || op_is_float_compare(op);
+    }
+}
+
+bool is_free(int op) { return op == SCONV || op == PCONV || op == ISP2CHAR || op == COMMA; }
+
+// What an operator costs beside its operands, a load included.
+int weight_of(const NODE* t) {
+    if (is_free(t->op) || number_of_operands[t->op] == 0) return 0;
+    if (t->op == DIV || t->op == MOD) return COST_OF_DIVISION;
+    return t->op == UMULT || t->op == STREF ? 2 : 1;
+}
+
+// ---- The numbers of a chain
+
+// A load whose place has not changed since.
+struct LOAD {
+    KEY key;
+    NODE* lvalue; // a copy
+    VALUE value;
+};
+
+class NUMBERS {
+public:
+    ~NUMBERS() { forget_loads(); }
+
+    void restart() {
+        forget_loads();
+        computed.clear();
+        variables.clear();
+    }
+
+    VALUE fresh() { return ++last; }
+    VALUE of_variable(const SYMTAB* sym) {
+        VALUE& v = variables[sym];
+        return v ? v : v = fresh();
+    }
+    void assign(const SYMTAB* sym, VALUE v) { variables[sym] = v; }
+
+    // Of a tree without effects.
+    VALUE of(const NODE* t);
+    int cost_of(const NODE* t); // of evaluating it
+    void begin_statement() { known.clear(); }
+    // Of `a op b` in the type of a variable, or a place, that has the number `a` and is stepped by `b`.
+    VALUE of_step(const NODE* asg, VALUE a, VALUE b);
+
+    void stored(const NODE* lvalue, VALUE v) {
+        begin_statement(); // the place may hold temporaries now
+        const KEY key = key_of_load(lvalue);
+        if (key.code) enter_load(key, lvalue, v);
+    }
+    // What evaluating `t` changes has no known value any more.
+    void forget_changed(const NODE* t) {
+        for_each_written_name(t, [this](const NODE* name, const NODE*) { variables[name->u.sym] = fresh(); });
+        auto gone = [t](const LOAD& l) {
+            if (!tree_modifies_lvalue_in_tree(t, l.lvalue)) return false;
+            erase_tree(l.lvalue);
+            return true;
+        };
+        loads.erase(std::remove_if(loads.begin(), loads.end(), gone), loads.end());
+    }
+
+private:
+    struct KNOWN {
+        VALUE value = 0;
+        int cost = -1;
+    };
+
+    VALUE find(const NODE* t);
+    VALUE of_name(const NODE* t);
+    VALUE of_load(const NODE* t);
+    VALUE of_operator(const NODE* t);
+    VALUE of_address(const NODE* place);
+    KEY key_of_load(const NODE* t);
+
+    VALUE computed_as(const KEY& key) {
+        VALUE& v = computed[key];
+        return v ? v : v = fresh();
+    }
+    void enter_load(const KEY& key, const NODE* lvalue, VALUE v) {
+        if (count_nodes_in_tree(lvalue) > MOST_NODES) return;
+        if (loads.size() == MOST_LOADS) {
+            erase_tree(loads.front().lvalue);
+            loads.erase(loads.begin());
+        }
+        loads.push_back({key, copy_tree(lvalue), v});
+    }
+    void forget_loads() {
+        for (const LOAD& l : loads) erase_tree(l.lvalue);
+        loads.clear();
+    }
+
+    VALUE last = 0;
+    std::unordered_map<KEY, VALUE, KEY_HASH> computed; // looked up, never walked
+    std::unordered_map<const SYMTAB*, VALUE> variables;
+    std::vector<LOAD> loads;
+    std::unordered_map<const NODE*, KNOWN> known; // of the trees of one statement
+};
+
+VALUE NUMBERS::of(const NODE* t) {
+    KNOWN& k = known[t];
+    return k.value ? k.value : k.value = find(t);
+}
+
+int NUMBERS::cost_of(const NODE* t) {
+    int& cost = known[t].cost;
+    if (cost < 0) {
+        int sum = weight_of(t);
+        if (t->left) sum += cost_of(t->left);
+        if (t->right) sum += cost_of(t->right);
+        cost = std::min(sum, 1 << 20);
+    }
+    return cost;
+}
+
+VALUE NUMBERS::find(const NODE* t) {
+    switch (t->op) {
+    case NAME: return of_name(t);
+    case ICON: return code_of(t->type) ? computed_as({ICON, code_of(t->type), t->u.lval.value, 0, 0}) : fresh();
+    case FCON: return fresh();
+    case UAND: return of_address(t->left);
+    case UMULT:
+    case STDOT:
+    case STREF: return of_load(t);
+    case ISP2CHAR: return t->left->type->is_pointer() && t->type->is_pointer() ? of(t->left) : fresh();
+    default: return is_computed(t->op) ? of_operator(t) : fresh();
+    }
+}
+
+VALUE NUMBERS::of_name(const NODE* t) {
+    const SYMTAB* sym = t->u.sym;
+    const unsigned code = code_of(t->type);
+    if (!sym || !code || code != code_of(sym->type)) return fresh();
+    return is_private_name(t) ? of_variable(sym) : of_load(t);
+}
+
+VALUE NUMBERS::of_operator(const NODE* t) {
+    const unsigned code = code_of(t->type), from = code_of(t->left->type);
+    if (!code || !from || (from == 1 && t->op == MINUS && code != 1)) return fresh(); // a difference counts elements
+    VALUE a = of(t->left), b = t->right ? of(t->right) : 0;
+    if (t->op == PCONV && code == from) return a; // between pointers
+    if (commute_inv[t->op] == t->op && b < a) std::swap(a, b);
+    // What a compare compares, and a cast converts from, its own type does not tell.
+    return computed_as({t->op, code, t->type->is_pointer() ? 0 : from, a, b});
+}
+
+VALUE NUMBERS::of_address(const NODE* place) {
+    int64_t offset = 0;
+    for (; place->op == STDOT; place = place->left) {
+        if (!place->right->mval || place->right->mval->is_bitfld) return fresh();
+        offset += place->right->mval->offset;
+    }
+    if (place->op == NAME && place->u.sym)
+        return computed_as({UAND, 1, identity(place->u.sym), static_cast<VALUE>(offset), 0});
+    return fresh();
+}
+
+// The key has no code where a tree is no load of a plain scalar.
+KEY NUMBERS::key_of_load(const NODE* t) {
+    const KEY none{t->op, 0, 0, 0, 0};
+    const unsigned code = code_of(t->type);
+    if (!code || lvalue_is_volatile(t)) return none;
+    int64_t offset = 0;
+    const NODE* place = t;
+    for (; place->op == STDOT; place = place->left) {
+        if (!place->right->mval || place->right->mval->is_bitfld) return none;
+        offset += place->right->mval->offset;
+    }
+    if (place->op == STREF) {
+        if (!place->right->mval || place->right->mval->is_bitfld) return none;
+        offset += place->right->mval->offset;
+    }
+    if (offset != static_cast<VALUE>(offset)) return none;
+    const auto at = static_cast<VALUE>(offset);
+    if (place->op == NAME && place->u.sym && !place->u.sym->is_function())
+        return {NAME, code, identity(place->u.sym), at, 0};
+    if ((place->op == UMULT && !place->right) || place->op == STREF) return {UMULT, code, 0, at, of(place->left)};
+    return none;
+}
+
+VALUE NUMBERS::of_load(const NODE* t) {
+    const KEY key = key_of_load(t);
+    if (!key.code) return fresh();
+    for (const LOAD& l : loads)
+        if (l.key == key) return l.value;
+    const VALUE v = fresh();
+    enter_load(key, t, v);
+    return v;
+}
+
+VALUE NUMBERS::of_step(const NODE* asg, VALUE a, VALUE b) {
+    const int op = op_of_opASG[asg->op];
+    const unsigned code = code_of(asg->left->type), by = code_of(asg->right->type);
+    const bool is_plain = is_computed(op) && code && (code == by || (code == 1 && asg->right->type->is_int()));
+    if (!is_plain) return fresh();
+    if (commute_inv[op] == op && b < a) std::swap(a, b);
+    return computed_as({op, code, code == 1 ? 0 : code, a, b});
+}
+
+// ---- The trees of a chain
+
+// What is known of a value: which variables have it, or where it was computed first and is computed again.
+struct OCCURRENCES {
+    std::vector<SYMTAB*> holders;
+    NODE** first = nullptr; // null: nowhere that it can be kept from
+    LIST* cell = nullptr;   // the statement of that
+    bool is_step = false;   // it is what a compound assignment, the whole statement, stores
+    int order = 0;          // behind that of all of its operands
+    size_t block = 0;       // the place in the chain
+    double gain = -COST_OF_ASSIGNMENT; // of keeping it
+    std::vector<NODE**> later;
+};
+
+// A temporary's assignment that is to stand ahead of a statement.
+struct KEPT {
+    int order;
+    NODE* assignment;
+};
+
+class COMMON_SUBEXPRESSIONS {
+public:
+    void run() {
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            const EDGE* before = bb->predecessors;
+            if (!chain_end || !before || before->rest || before->first != chain_end) end_chain();
+            block(bb);
+        }
+        end_chain();
+        if (has_new_symbols) sym_split(currfuninfo);
+    }
+
+private:
+    void block(BBLK* bb);
+    void end_chain();
+    bool reads_come_first(const NODE* t) const;
+    void statement(LIST* s);
+    void assignment(LIST* s);
+    bool is_redundant(const NODE* t);
+    void learn_store(const NODE* t, VALUE v);
+    void read(NODE*& slot, bool is_certain);
+    void read_operands(NODE* t, bool is_certain);
+    void read_place(NODE* t);
+    bool reuse(NODE*& slot, bool is_certain);
+    SYMTAB* holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type);
+    void keep(OCCURRENCES& known, VALUE v);
+    NODE* take_first(OCCURRENCES& known, SYMTAB* variable);
+
+    NUMBERS numbers;
+    std::unordered_map<VALUE, OCCURRENCES> values; // looked up, never walked
+    std::unordered_map<const LIST*, std::vector<KEPT>> ahead;
+    std::vector<BBLK*> blocks; // of the chain
+    const BBLK* chain_end = nullptr;
+    LIST* current = nullptr;
+    int order = 0;
+    long dropped = 0;
+    bool has_new_symbols = false;
+};
+
+void COMMON_SUBEXPRESSIONS::block(BBLK* bb) {
+    blocks.push_back(bb);
+    chain_end = bb;
+    bool any_dropped = false;
+    for (LIST* s = bb->statements; s; s = s->rest) {
+        statement(s);
+        any_dropped |= !s->first;
+        if (s->first && tree_is_EH_SWITCH(s->first)) chain_end = nullptr;
+    }
+    if (any_dropped) drop_empty_cells(&bb->statements);
+}
+
+// The assignments to temporaries take their places: in order, and ahead of the pragmas that speak of what follows.
+void COMMON_SUBEXPRESSIONS::end_chain() {
+    for (BBLK* bb : blocks) {
+        if (ahead.empty()) break;
+        LIST** pragmas = nullptr;
+        for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
+            auto it = ahead.find(*link);
+            if (it != ahead.end()) {
+                LIST** at = pragmas ? pragmas : link;
+                LIST* statement = *link;
+                std::sort(it->second.begin(), it->second.end(),
+                          [](const KEPT& a, const KEPT& b) { return a.order < b.order; });
+                for (const KEPT& kept : it->second) at = &(*insert_before(at, kept.assignment, statement->psn));
+                while (*link != statement) link = &(*link)->rest;
+            }
+            if ((*link)->first->op != PPRAGMA)
+                pragmas = nullptr;
+            else if (!pragmas)
+                pragmas = link;
+        }
+    }
+    ahead.clear();
+    blocks.clear();
+    values.clear();
+    numbers.restart();
+    chain_end = nullptr;
+}
+
+// All of its operands are evaluated ahead of the one effect of the statement.
+bool COMMON_SUBEXPRESSIONS::reads_come_first(const NODE* t) const {
+    auto acts = [](const NODE* n) { return n && tree_has_side_effects(n); };
+    switch (t->op) {
+    case RETURN: return !acts(t->right);
+    case IF:
+    case SWITCH: return t->left->op != ENDLOOP && !acts(t->left);
+    case CALL: return !acts(t->left) && !acts(t->right);
+    case ASG:
+        if (tree_is_arg_prolog(t) || acts(t->left)) return false;
+        return t->right->op == CALL ? reads_come_first(t->right) : !acts(t->right);
+    case STASG: return !tree_is_arg_prolog(t) && !acts(t->left) && !acts(t->right);
+    default: return is_operator_assignment(t) && t->right && !acts(t->left) && !acts(t->right);
+    }
+}
+
+void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
+    NODE* t = s->first;
+    current = s;
+    numbers.begin_statement();
+    if (!reads_come_first(t)) {
+        numbers.forget_changed(t);
+        return;
+    }
+    switch (t->op) {
+    case RETURN:
+        if (t->right) read(t->right, true);
+        return;
+    case IF: // its own compare stays what the control flow is read from
+    case SWITCH: read_operands(t->left, true); return;
+    case CALL:
+        read_operands(t, true);
+        numbers.forget_changed(t);
+        return;
+    default: assignment(s);
+    }
+}
+
+bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
+    return t->op == ASG && is_private_name(t->left) && t->right->op != CALL &&
+           code_of(t->left->type) == code_of(t->right->type) && code_of(t->left->type) &&
+           numbers.of(t->right) == numbers.of(t->left);
+}
+
+void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
+    NODE* t = s->first;
+    if (is_redundant(t)) {
+        if (print_debug) {
+            debug_printf("\n\t(%ld) REDUNDANT ASSIGNMENT ELIMINATED IN LCSE:\n", ++dropped);
+            debug_printf("%s\n", stmt2infix(t).c_str());
+        }
+        erase_tree(t);
+        s->first = nullptr;
+        return;
+    }
+    VALUE v = 0;
+    const bool is_plain = t->op == ASG || t->op == STASG;
+    if (t->right->op == CALL || t->op == STASG) {
+        read_operands(t->right, true);
+    } else {
+        v = numbers.of(t->right);
+        if (!is_plain) v = numbers.of_step(t, numbers.of(t->left), v);
+        read(t->right, true);
+    }
+    read_place(t->left);
+    numbers.forget_changed(t);
+    if (v && code_of(t->left->type) == code_of(is_plain ? t->right->type : t->left->type)) learn_store(t, v);
+}
+
+// Whether `x op= e` is `x = x op e` in the type of x.
+bool holds_step(const NODE* t) {
+    return op_of_opASG[t->op] != ILLOP && t->left->type->is_int() &&
+           compound_ASG_computes_in(t->left->type->stqs(), op_of_opASG[t->op], t->left, t->right);
+}
+
+// The target has the value from here on.
+void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
+    const NODE* to = t->left;
+    if (is_private_name(to)) {
+        if (code_of(to->type) != code_of(to->u.sym->type)) return;
+        numbers.assign(to->u.sym, v);
+        if (to->u.sym->type->qual_kind(false) & QUAL_RESTRICT) return; // what it points to would count as reached by it
+        std::vector<SYMTAB*>& holders = values[v].holders;
+        if (holders.size() == MOST_HOLDERS) holders.erase(holders.begin());
+        holders.push_back(to->u.sym);
+        return;
+    }
+    const NODE* object = without_members(to);
+    if (object->op != NAME && tree_modifies_lvalue_in_tree(t, object->left)) return;
+    numbers.stored(to, v);
+    OCCURRENCES& known = values[v];
+    if (t->op == ASG || known.first || !holds_step(t)) return;
+    known.first = &current->first;
+    known.cell = current;
+    known.is_step = true;
+    known.order = ++order;
+    known.block = blocks.size();
+    known.gain -= 1 + numbers.cost_of(to);
+}
+
+// ---- Reads
+
+void COMMON_SUBEXPRESSIONS::read(NODE*& slot, bool is_certain) {
+    if (!slot || number_of_operands[slot->op] == 0) return;
+    if (!reuse(slot, is_certain)) read_operands(slot, is_certain);
+}
+
+void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
+    switch (t->op) {
+    case UAND:
+    case ARGREF:
+    case STARG:
+    case STDOT: read_place(t->left); return;
+    case ANDAND:
+    case OROR:
+    case QUEST:
+        read(t->left, is_certain);
+        read(t->right, false);
+        return;
+    case STREF: read(t->left, is_certain); return;
+    default:
+        read(t->left, is_certain);
+        read(t->right, is_certain);
+    }
+}
+
+// The place is not read here, but the pointer that it lies behind is.
+void COMMON_SUBEXPRESSIONS::read_place(NODE* t) {
+    NODE* object = without_members(t);
+    if (object->op == UMULT || object->op == STREF) read(object->left, false);
+}
+
+SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {
+    for (auto it = known.holders.rbegin(); it != known.holders.rend(); ++it)
+        if (numbers.of_variable(*it) == v && code_of((*it)->type) == code_of(type)) return *it;
+    return nullptr;
+}
+
+// False where the operands are still to be looked at.
+bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
+    NODE* t = slot;
+    if (!good_CSE_tree(t, false) || !code_of(t->type)) return false;
+    if (!is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF) return false;
+    const VALUE v = numbers.of(t);
+    OCCURRENCES& known = values[v];
+    if (SYMTAB* holder = holder_of(known, v, t->type)) {
+        slot = coerce_to_type(t->type->stqs(), mk_NAME(holder, t->ls));
+        erase_tree(t);
+        return true;
+    }
+    if (!known.first) {
+        if (!is_certain) return false;
+        known.first = &slot;
+        known.cell = current;
+        known.block = blocks.size();
+        read_operands(t, is_certain);
+        known.order = ++order;
+        return true;
+    }
+    known.later.push_back(&slot);
+    // A block further on is entered every other time.
+    known.gain += std::ldexp(numbers.cost_of(t), static_cast<int>(known.block) - static_cast<int>(blocks.size()));
+    if (known.gain > 0) keep(known, v);
+    return true;
+}
+
+// What the first occurrence computes, which a NAME of the variable then stands for.
+NODE* COMMON_SUBEXPRESSIONS::take_first(OCCURRENCES& known, SYMTAB* variable) {
+    NODE* t = *known.first;
+    if (!known.is_step) {
+        *known.first = mk_NAME(variable, t->ls);
+        return t;
+    }
+    *known.first = mk_ASG(copy_tree(t->left), mk_NAME(variable, t->ls));
+    t->op = op_of_opASG[t->op];
+    t->type = t->left->type->stqs();
+    return t;
+}
+
+void COMMON_SUBEXPRESSIONS::keep(OCCURRENCES& known, VALUE v) {
+    const NODE* first = *known.first;
+    SYMTAB* variable = sym_temp('N', -1, first->type->stqs(), first->ls);
+    NODE* value = take_first(known, variable);
+    NODE* assignment = mk_ASG(mk_NAME(variable, value->ls), value);
+    ahead[known.cell].push_back({known.order, assignment});
+    for (NODE** slot : known.later) {
+        NODE* t = *slot;
+        *slot = coerce_to_type(t->type->stqs(), mk_NAME(variable, t->ls));
+        erase_tree(t);
+    }
+    known.later.clear();
+    known.first = nullptr;
+    numbers.assign(variable, v);
+    known.holders.push_back(variable);
+    has_new_symbols = true;
+}
+
+} // namespace
+
+void lcse() {
+    if (!currfuninfo || !currfuninfo->bb_list) return;
+    need(fact::alias);
+    COMMON_SUBEXPRESSIONS().run();
+    changed(fact::graph);
+}

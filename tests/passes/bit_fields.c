@@ -30,7 +30,8 @@ int calls;
 int next(void) { return calls++ & 1; }
 
 // FUNCTION: reads
-// HAS: return ((int)(*((unsigned int *)p + 1) << 7) >> 7) + (int)(*(unsigned int *)p >> 1 & 3) + ((int)*((unsigned int *)p + 1) >> 9)
+// HAS: $O$N0 = *((unsigned int *)p + 1)
+// HAS: return ((int)($O$N0 << 7) >> 7) + (int)(*(unsigned int *)p >> 1 & 3) + ((int)$O$N0 >> 9)
 int reads(struct flags *p) { return p->d + p->b + p->e; }
 
 // Neighbouring stores to one container are one.
@@ -67,7 +68,7 @@ int watched(int v) {
 }
 
 // FUNCTION: across_units
-// HAS: *(unsigned long *)&_w = *(unsigned long *)&_w & 4293918720 | 70000
+// HAS: /= [*][(]unsigned long [*][)]&_w & 4293918720 [|] 70000$/
 // HAS: /_m \+ 1\) = \(unsigned int\)v$/
 long across_units(int v) {
     w.x = 70000;

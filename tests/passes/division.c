@@ -48,7 +48,8 @@ long long widest(long long x) { return x / 8; }
 long long widest_by_seven(long long x) { return x / 7; }
 
 // FUNCTION: digits
-// COUNT 2: x >> 32) * 3435973836
+// The remainder takes the quotient that the division by the same constant finds.
+// COUNT 1: x >> 32) * 3435973836
 // NOT: / 10
 // NOT: % 10
 // COUNT 0: /^(sum|x)$/

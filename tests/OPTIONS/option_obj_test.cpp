@@ -148,37 +148,16 @@ TEST(OptionParse, OtherCaseIsTakenWithAWarning) {
 }
 
 TEST(OptionParse, NumbersByRadix) {
-    struct CASE {
-        const char* text;
-        bool good;
-        long value;
-    };
-    const CASE cases[] = {
-        {"0", true, 0},
-        {"10", true, 10},
-        {"010", true, 8},
-        {"0x1F", true, 31},
-        {"0b101", true, 5},
-        {"-7", true, -7},
-        {"+7", true, 7},
-        {"-0x10", true, -16},
-        {"", false, 0},
-        {"0x", false, 0},
-        {"--1", false, 0},
-        {"08", false, 0},
-        {"0b2", false, 0},
-        {"1 ", false, 0},
-        {" 1", false, 0},
-        {"9223372036854775807", true, LONG_MAX},
-        {"9223372036854775808", false, 0},
-    };
-    for (const CASE& c : cases) {
-        long value = 0;
-        EXPECT_EQ(O::strtol_by_radix(c.text, &value), c.good) << c.text;
-        if (c.good) {
-            EXPECT_EQ(value, c.value) << c.text;
-        }
+    const std::pair<const char*, long> numbers[] = {{"0", 0},     {"10", 10},     {"010", 8},
+                                                    {"0x1F", 31}, {"0b101", 5},   {"-7", -7},
+                                                    {"+7", 7},    {"-0x10", -16}, {"9223372036854775807", LONG_MAX}};
+    long value = 0;
+    for (const auto& [text, number] : numbers) {
+        EXPECT_TRUE(O::strtol_by_radix(text, &value)) << text;
+        EXPECT_EQ(value, number) << text;
     }
+    for (const char* text : {"", "0x", "--1", "08", "0b2", "1 ", " 1", "9223372036854775808"})
+        EXPECT_FALSE(O::strtol_by_radix(text, &value)) << text;
 }
 
 // Every option, every item, every kind of argument: what is exported parses to the same state.

@@ -106,12 +106,23 @@ protected:
         }
         return lines;
     }
+    // Runs without optimization, or by these options; the dump of the output.
+    std::string optimized(const std::vector<std::string>& options = {"--opt_level=off"}) {
+        const RESULT r = optimize(options);
+        EXPECT_EQ(r.status, 0) << r.err;
+        return r.status == 0 ? dump() : "";
+    }
+    // The output of the last run, read by a type package of its own.
+    IC_UNIT& read_back() {
+        tp = &output_types;
+        TYPE_PKG::init_type_pkg(tp);
+        output.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), tp);
+        return output;
+    }
     // Runs at a level and expects these lines one behind the other, with anything between.
     void expect_lines(const std::vector<std::string>& wanted,
                       const std::vector<std::string>& options = {"--opt_level=off"}) {
-        const RESULT r = optimize(options);
-        ASSERT_EQ(r.status, 0) << r.err;
-        const std::string text = dump();
+        const std::string text = optimized(options);
         size_t from = 0;
         for (const std::string& line : wanted) {
             const size_t at = text.find("\n" + line + "\n", from);
@@ -146,4 +157,6 @@ protected:
     TYPE* int_fn;
     IC_SYMBOL *main_sym = nullptr, *x = nullptr, *y = nullptr;
     WORKPLACE place;
+    TYPE_PKG output_types;
+    IC_UNIT output;
 };

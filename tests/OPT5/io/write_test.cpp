@@ -18,8 +18,7 @@ TEST_F(WriteTest, WideConstantsAreLconsOnlyWhereTheyMustBe) {
     statement(node(op::ASG, pkg.llong_t, name(small), fits));
     ret(icon(0));
     end();
-    const RESULT r = optimize({"--opt_level=off"});
-    ASSERT_EQ(r.status, 0) << r.err;
+    optimized();
     const std::string raw = place.get("unit.opt");
     EXPECT_NE(raw.find(std::string("4294967296\0", 11)), std::string::npos);
     EXPECT_EQ(raw.find("-2147483648"), std::string::npos) << "it fits an ICON";
@@ -51,9 +50,7 @@ TEST_F(WriteTest, ParametersKeepTheirOrderAndUnusedLocalsGo) {
     statement(node(op::PCOMMA, pkg.void_t, node(op::ASG, pkg.int_t, name(a2), name(a)), node(op::ASG, pkg.int_t, name(c2), name(c))));
     statement(node(op::RETURN, pkg.int_t, name(f), node(op::PLUS, pkg.int_t, name(a2), name(c2))));
     end();
-    const RESULT r = optimize({"--opt_level=off"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    const std::string text = dump();
+    const std::string text = optimized();
     const size_t pa = text.find("0 a: int, class 17"), pb = text.find("1 b: long, class 17"), pc = text.find("2 c: int, class 17");
     EXPECT_TRUE(pa < pb && pb < pc && pc != std::string::npos) << text;
     EXPECT_EQ(text.find("idle"), std::string::npos);
@@ -74,9 +71,7 @@ TEST_F(WriteTest, DeclaredTypesComeBack) {
     statement(node(op::ASG, pkg.short_t, name(s), icon(4)));
     ret(icon(0));
     end();
-    const RESULT r = optimize({"--opt_level=off"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    const std::string text = dump();
+    const std::string text = optimized();
     EXPECT_NE(text.find("_g: volatile enum color"), std::string::npos) << text;
     EXPECT_NE(text.find("_s: short"), std::string::npos) << text;
     EXPECT_NE(text.find("red = 3"), std::string::npos) << text;
@@ -105,13 +100,8 @@ TEST_F(TableTest, UnusedEntriesGoAndCallsAreRenumbered) {
     table[2].cleanup = call(f);
     file->if_write_func_eht(table.data(), 4);
     end();
-    const RESULT r = optimize({"--opt_level=off"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    IC_UNIT unit;
-    TYPE_PKG types;
-    tp = &types;
-    TYPE_PKG::init_type_pkg(&types);
-    unit.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), &types);
+    optimized();
+    IC_UNIT& unit = read_back();
     const IC_ITEM* eht = nullptr;
     const IC_NODE* tree = nullptr;
     for (const IC_ITEM& item : unit.items) {
@@ -140,16 +130,10 @@ TEST_F(TableTest, HandlersStayReachableAndTheirLabelsFollow) {
     table[1].catches.push_back({"int", 77, false});
     file->if_write_func_eht(table.data(), 2);
     end();
-    const RESULT r = optimize({"--opt_level=off"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    const std::string text = dump();
+    const std::string text = optimized();
     EXPECT_NE(text.find("\nL1:\nreturn y\n"), std::string::npos) << text;
     EXPECT_EQ(text.find("dispatch"), std::string::npos) << "it is not for the code generator";
-    IC_UNIT unit;
-    TYPE_PKG types;
-    tp = &types;
-    TYPE_PKG::init_type_pkg(&types);
-    unit.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), &types);
+    IC_UNIT& unit = read_back();
     for (const IC_ITEM& item : unit.items)
         if (item.kind == IFR_EHT_HEADER) {
             EXPECT_EQ(item.eht[1].catches.at(0).label, 1u);
@@ -167,13 +151,8 @@ TEST_F(WriteTest, StaticDataNamedOnlyByAnInitializerIsKept) {
     file->if_write_init(pointer);
     file->if_write_expr_node(node(op::UAND, pkg.mk_ptr(pkg.int_t), name(target)));
     file->if_write_expr_node(node(op::ENDINIT, pkg.int_t));
-    const RESULT r = optimize({"--opt_level=3", "--call_assumptions=3"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    IC_UNIT unit;
-    TYPE_PKG types;
-    tp = &types;
-    TYPE_PKG::init_type_pkg(&types);
-    unit.read(std::fopen((place.dir + "/unit.opt").c_str(), "rb"), &types);
+    optimized({"--opt_level=3", "--call_assumptions=3"});
+    IC_UNIT& unit = read_back();
     for (const IC_SYMBOL* s : unit.globals)
         if (std::string(s->name) == "_target") {
             EXPECT_NE(s->retention, I_SYMTAB::RETENTION_DROP);

@@ -25,35 +25,6 @@ TEST_F(Algebra, RangesGiveTheirCommonBits) {
     EXPECT_EQ(find_known_ones_in_range(INT65(8), INT65(11)), INT65(8));
 }
 
-// What has an effect, or could change in between, is not joined or dropped.
-TEST_F(Algebra, EffectsStay) {
-    SYMTAB* v = symbol("v", tp->mk_qual(tp->int_t, QUAL_VOLATILE));
-    SYMTAB* x = symbol("x", tp->int_t);
-    struct ROW {
-        NODE* tree;
-        int calls_and_reads;
-    } rows[] = {
-        {bin(MINUS, name(v), name(v), tp->int_t), 2},
-        {bin(XORB, name(v), name(v), tp->int_t), 2},
-        {bin(MULT, name(v), icon(0), tp->int_t), 1},
-        {bin(ANDB, call("f", tp->int_t), icon(0)), 1},
-        {bin(EQ, call("f", tp->int_t), call("f", tp->int_t)), 2},
-        {bin(PLUS, un(UMINUS, call("f", tp->int_t)), call("g", tp->int_t)), 2},
-    };
-    for (ROW& row : rows) {
-        const std::string before = show(row.tree);
-        row.tree = simp_tree(row.tree, nullptr);
-        int n = 0;
-        for_each_node(row.tree, [&](NODE* t) { n += op_is_call(t->op) || (t->op == NAME && t->u.sym == v); });
-        EXPECT_EQ(n, row.calls_and_reads) << before << " -> " << show(row.tree);
-        erase_tree(row.tree);
-    }
-    // -f() + g() calls f first.
-    NODE* t = simp_tree(bin(PLUS, un(UMINUS, call("f", tp->int_t)), name(x)), nullptr);
-    EXPECT_EQ(t->op, PLUS) << show(t);
-    erase_tree(t);
-}
-
 // ---- A known value in place of a tree
 
 TEST_F(Algebra, KnownValuesReplaceTrees) {

@@ -53,29 +53,6 @@ protected:
     }
 };
 
-TEST_F(Families, EffectsComeBeforeWhatUsesThem) {
-    auto comma = [](NODE* a, NODE* b) { return bin(COMMAOP, a, b, b->type); };
-    auto set = [](NODE* a, NODE* b) { return bin(ASG, a, b, a->type); };
-    NODE* p = name(ps);
-    const ROW rows[] = {
-        {bin(MULT, comma(f(), x()), comma(f(), y())), "f(), x * (f(), y)"}, // f could change x
-        {bin(MULT, icon(7), comma(f(), y())), "f(), y * 7"},
-        {bin(PLUS, x(), comma(set(y(), icon(1)), icon(2))), "y = 1, x + 2"},
-        {bin(PLUS, x(), comma(set(x(), icon(1)), icon(2))), "x + (x = 1, 2)"},
-        {bin(PLUS, set(x(), icon(4)), icon(1)), "x = 4, 5"},
-        {bin(PLUS, f(), set(x(), icon(4))), "f() + (x = 4)"},
-        {set(x(), comma(f(), y())), "f(), x = y"},
-        {set(deref(p), comma(f(), y())), "*p = (f(), y)"}, // f could change p
-        {deref(comma(f(), name(ps))), "f(), *p"},
-        {bin(ANDAND, x(), comma(f(), y())), "x && (f(), y)"},
-        {bin(QUEST, comma(f(), x()), bin(COLON, y(), icon(0)), tp->int_t), "f(), x ? y : 0"},
-        {comma(x(), y()), "y"},
-        {comma(comma(f(), x()), y()), "f(), y"},
-        {comma(bin(PLUS, f(), x()), y()), "f(), y"},
-    };
-    check(rows);
-}
-
 TEST_F(Families, BuiltInFunctions) {
     auto ternary = [](NODE* c, NODE* a, NODE* b) {
         return make_strict_ternary_ICALL(bin(QUEST, c, bin(COLON, a, b, a->type), a->type));

@@ -56,28 +56,9 @@ protected:
 };
 
 TEST_F(Unrolling, CheapBodies) {
-    struct ROW {
-        long count, factor;
-    };
-    for (ROW r : {ROW{0, 1},
-                  {1, 1},
-                  {2, 2},
-                  {3, 3},
-                  {4, 4},
-                  {6, 6},
-                  {7, 1},
-                  {8, 1},
-                  {10, 2},
-                  {12, 2},
-                  {15, 3},
-                  {18, 3},
-                  {13, 1},
-                  {25, 3},
-                  {28, 2},
-                  {23, 2},
-                  {29, 2},
-                  {21, 3}})
-        EXPECT_EQ(factor(cheap(), r.count), r.factor) << r.count;
+    const long rows[][2] = {{0, 1},  {1, 1},  {2, 2},  {3, 3},  {4, 4},  {6, 6},  {7, 1},  {8, 1},  {10, 2},
+                            {12, 2}, {15, 3}, {18, 3}, {13, 1}, {25, 3}, {28, 2}, {23, 2}, {29, 2}, {21, 3}};
+    for (auto [count, wanted] : rows) EXPECT_EQ(factor(cheap(), count), wanted) << count;
     set_goal(GOAL_3);
     EXPECT_EQ(factor(cheap(), 3), 3);
     EXPECT_EQ(factor(cheap(), 6), 1);

@@ -54,19 +54,12 @@ TEST_F(ExecTest, BuiltInFunctionsOfIntegers) {
         {"__rpt_norm_dec", i, l, {-65536, 100, 16}, 85},
         {"__rpt_norm_dec", i, l, {0, 100, 16}, 100},
     };
-    begin(main_sym);
-    body();
+    begin_main();
     std::string expected;
     for (const auto& r : rows) {
-        std::vector<IC_NODE*> operands;
-        for (int64_t v : r.operands) operands.push_back(num(v, r.operand));
-        IC_NODE* n = node(ICALL, r.result, list(operands));
-        n->text = r.name;
-        put(n);
+        put(built_in(ICALL, r.result, r.name, numbers(r.operands, r.operand)));
         expected += std::to_string(r.expected) + "\n";
     }
-    ret(0);
-    end();
     expect_output(expected);
 }
 
@@ -118,19 +111,12 @@ TEST_F(ExecTest, BasicOperators) {
         {"ETSI_L_SHR_R", {-1, 1}, 0},
         {"ETSI_L_SHIFT_R", {5, -1}, 3},
     };
-    begin(main_sym);
-    body();
+    begin_main();
     std::string expected;
     for (const auto& r : rows) {
-        std::vector<IC_NODE*> operands;
-        for (int64_t v : r.operands) operands.push_back(num(v, pkg.long_t));
-        IC_NODE* n = node(ICALL, pkg.long_t, list(operands));
-        n->text = r.name;
-        put(n);
+        put(built_in(ICALL, pkg.long_t, r.name, numbers(r.operands, pkg.long_t)));
         expected += std::to_string(r.expected) + "\n";
     }
-    ret(0);
-    end();
     expect_output(expected);
 }
 
@@ -154,8 +140,6 @@ TEST_F(ExecTest, LongDivisionBySteps) {
         put(name(rest));
         expected += std::to_string(r[3]) + "\n" + std::to_string(r[4]) + "\n";
     }
-    ret(0);
-    end();
     expect_output(expected);
 }
 
@@ -172,8 +156,6 @@ TEST_F(ExecTest, RepeatedStoresFill) {
         statement(fill);
         put(name(words));
     }
-    ret(0);
-    end();
     expect_output("327686\n393215\n-1\n");
 }
 
@@ -197,20 +179,16 @@ TEST_F(ExecTest, BuiltInFunctionsOfSingles) {
         {"__atan2puf32", pkg.float_t, "1", "0", nullptr, 2},
         {"__atan2puf32", pkg.float_t, "-1", "-1", nullptr, -3},
     };
-    begin(main_sym);
-    body();
+    begin_main();
     std::string expected;
     for (const auto& r : rows) {
         std::vector<IC_NODE*> operands;
         for (const char* t : {r.a, r.b, r.c})
             if (t) operands.push_back(real(t, pkg.float_t));
-        IC_NODE* n = node(ICALL, r.result, list(operands));
-        n->text = r.name;
+        IC_NODE* n = built_in(ICALL, r.result, r.name, operands);
         put(node(MULT, pkg.float_t, node(SCONV, pkg.float_t, n), real("8", pkg.float_t)));
         expected += std::to_string(r.expected) + "\n";
     }
-    ret(0);
-    end();
     expect_output(expected);
 }
 
@@ -243,15 +221,12 @@ TEST_F(ExecTest, MultiplyAccumulateShiftsByTheProductMode) {
         operands.push_back(node(ARGREF, to_long, name(acc)));
         operands.push_back(node(ARGREF, to_long, name(product)));
         operands.push_back(num(r.mode, pkg.int_t));
-        IC_NODE* n = node(MCALL, pkg.void_t, list(operands));
-        n->text = r.name;
+        IC_NODE* n = built_in(MCALL, pkg.void_t, r.name, operands);
         statement(n);
         put(name(acc));
         put(name(product));
         expected += std::to_string(r.acc) + "\n" + std::to_string(r.product) + "\n";
     }
-    ret(0);
-    end();
     expect_output(expected);
 }
 
@@ -270,8 +245,6 @@ TEST_F(ExecTest, NormCountsTheShifts) {
         put(name(count));
         expected += std::to_string(r[2]) + "\n" + std::to_string(r[1]) + "\n";
     }
-    ret(0);
-    end();
     expect_output(expected);
 }
 } // namespace

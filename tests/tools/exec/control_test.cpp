@@ -53,7 +53,6 @@ TEST_F(ControlTest, AddressOfNoFunctionIsReported) {
     body();
     statement(set(p, num(4096, to)));
     statement(node(UCALL, pkg.int_t, name(p)));
-    end();
     expect_error(EXEC_BAD_ADDRESS, "no function");
 }
 
@@ -68,9 +67,7 @@ class PromiseTest : public ControlTest, public testing::WithParamInterface<PROMI
 TEST_P(PromiseTest, IsHeldAgainstTheRun) {
     const PROMISE_ROW& row = GetParam();
     promised(row.keyword, row.promise, row.count);
-    EXEC_OPTIONS options;
-    options.check = true;
-    const EXEC_RESULT r = run(options);
+    const EXEC_RESULT r = run(checked());
     EXPECT_EQ(r.status, row.fault ? int{EXEC_TRIPS} : 0) << r.error;
     if (!row.fault) return;
     EXPECT_NE(r.error.find(row.fault), std::string::npos) << r.error;
@@ -114,14 +111,11 @@ TEST_F(ControlTest, PromisesAreOfEachEntryAndActivation) {
     statement(node(PLUSASG, pkg.int_t, name(i), num(-1, pkg.int_t)));
     unless(node(EQ, pkg.int_t, name(i), num(0, pkg.int_t)), 1);
     end();
-    begin(main_sym);
-    body();
+    begin_main();
     for (int k = 0; k < 2; k++) statement(call(f, num(2, pkg.int_t)));
     ret(0);
     end();
-    EXEC_OPTIONS options;
-    options.check = true;
-    EXPECT_EQ(run(options).status, 0);
+    EXPECT_EQ(run(checked()).status, 0);
 }
 
 TEST_F(ControlTest, LoopRecordsPromise) {
@@ -134,9 +128,6 @@ TEST_F(ControlTest, LoopRecordsPromise) {
     statement(node(NOTB, pkg.uint_t, name(i)));
     statement(node(ENDLOOP, pkg.uint_t, name(i), label(1)));
     ret(0);
-    end();
-    EXEC_OPTIONS options;
-    options.check = true;
-    expect_error(EXEC_TRIPS, "iterated 5 times where at least 1 in multiples of 2", options);
+    expect_error(EXEC_TRIPS, "iterated 5 times where at least 1 in multiples of 2", checked());
 }
 } // namespace

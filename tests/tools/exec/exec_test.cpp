@@ -69,16 +69,13 @@ TEST_F(ExecTest, UnalignedObjectIsReported) {
     body();
     statement(node(ASG, p->type, name(p), num(4097, p->type)));
     statement(node(UMULT, pkg.long_t, name(p)));
-    end();
     expect_error(EXEC_UNALIGNED, "unaligned");
 }
 
 TEST_F(ExecTest, MissingFunctionIsReported) {
     IC_SYMBOL* f = global("_nowhere", function_type({}, pkg.int_t), 5);
-    begin(main_sym);
-    body();
+    begin_main();
     statement(call(f, nullptr));
-    end();
     expect_error(EXEC_MISSING, "nowhere");
 }
 
@@ -87,40 +84,31 @@ TEST_F(ExecTest, RecursionWithoutEndIsAStackOverflow) {
     local("x", pkg.llong_t);
     body();
     statement(call(main_sym, nullptr));
-    end();
     expect_error(EXEC_STACK, "stack overflow");
 }
 
 TEST_F(ExecTest, FalseAssertionIsReportedOnRequest) {
-    begin(main_sym);
-    body();
+    begin_main();
     statement(node(NASSERT, pkg.int_t, num(0, pkg.int_t)));
     ret(0);
-    end();
-    EXEC_OPTIONS options;
-    options.check = true;
-    expect_error(EXEC_CHECK, "asserted", options);
+    expect_error(EXEC_CHECK, "asserted", checked());
 }
 
 // Files that no parser writes: an operation on types that it has no form for, an operand of no type.
 TEST_F(ExecTest, WhatHasNoFormIsRefused) {
-    begin(main_sym);
-    body();
+    begin_main();
     statement(node(ENDLOOP, pkg.int_t, name(main_sym), label(1)));
     file->if_write_label(1);
-    end();
     expect_error(EXEC_UNSUPPORTED, "operands of such types");
 }
 
 TEST_F(ExecTest, WhatHasNoTypeIsRefused) {
     TYPE* pair = structure("pair", 32, {{"a", pkg.int_t, 0, 0}});
     IC_SYMBOL* s = global("_s", pair);
-    begin(main_sym);
-    body();
+    begin_main();
     IC_NODE* const untyped = name(s);
     untyped->type = nullptr;
     statement(node(EQ, pkg.int_t, untyped, name(s)));
-    end();
     expect_error(EXEC_UNSUPPORTED, "cannot execute EQ");
 }
 
@@ -149,8 +137,6 @@ TEST_F(ExecTest, FloatingComparisonsOfNumbersInfinitiesAndNoNumbers) {
                 expected += outcome & true_for[k] ? "1\n" : "0\n";
             }
         }
-    ret(0);
-    end();
     expect_output(expected);
 }
 } // namespace

@@ -99,6 +99,8 @@ protected:
     }
     // main ends and all is run; what it prints is compared.
     void expect_output(const std::string& expected, EXEC_OPTIONS options = {}) {
+        ret(0);
+        end();
         const EXEC_RESULT r = run(options);
         EXPECT_FALSE(r.failed) << r.error;
         EXPECT_EQ(printed, expected);
@@ -111,7 +113,23 @@ protected:
     IC_NODE* call(IC_SYMBOL* f, IC_NODE* args) {
         return node(args ? CALL : UCALL, f->type->return_type(), node(UAND, pkg.mk_ptr(f->type), name(f)), args);
     }
+    static EXEC_OPTIONS checked() {
+        EXEC_OPTIONS options;
+        options.check = true;
+        return options;
+    }
+    std::vector<IC_NODE*> numbers(const std::vector<int64_t>& values, TYPE* type) {
+        std::vector<IC_NODE*> trees;
+        for (int64_t v : values) trees.push_back(num(v, type));
+        return trees;
+    }
+    IC_NODE* built_in(int opcode, TYPE* type, const char* callee, const std::vector<IC_NODE*>& args) {
+        IC_NODE* n = node(opcode, type, args.empty() ? nullptr : list(args));
+        n->text = callee;
+        return n;
+    }
     void begin(IC_SYMBOL* f) { file->if_write_begin_func(f, &psn), file->if_write_end_args(&psn); }
+    void begin_main() { begin(main_sym), body(); }
     void body() { file->if_write_end_locals(&psn); }
     void statement(IC_NODE* tree) {
         ++psn.line;
@@ -135,8 +153,9 @@ protected:
         std::free(text);
         return r;
     }
-    // The unit ends with this status and a message that holds the text.
+    // main is closed; the unit ends with this status and a message that holds the text.
     void expect_error(int status, const char* text, EXEC_OPTIONS options = {}) {
+        end();
         const EXEC_RESULT r = run(options);
         EXPECT_TRUE(r.failed);
         EXPECT_EQ(r.status, status) << r.error;

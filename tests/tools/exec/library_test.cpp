@@ -4,8 +4,7 @@
 namespace {
 TEST_F(ExecTest, PrintfTakesEachArgumentInItsWidth) {
     IC_SYMBOL* print = global("_printf", function_type({pkg.mk_ptr(pkg.schar_t)}, pkg.int_t, true), 5);
-    begin(main_sym);
-    body();
+    begin_main();
     statement(call(print, list({text("%d %u %ld %lld|"), num(-1, pkg.int_t), num(65535, pkg.uint_t),
                                 num(-100000, pkg.long_t), num(INT64_MIN, pkg.llong_t)})));
     statement(call(print,
@@ -13,8 +12,6 @@ TEST_F(ExecTest, PrintfTakesEachArgumentInItsWidth) {
                          num(42, pkg.int_t), num(65535, pkg.uint_t), num(0xABCDEF, pkg.ulong_t)})));
     put(call(print, list({text("%s %c%% %.2f %e\n"), text("text"), num('z', pkg.int_t), real("2.125", pkg.ldouble_t),
                           real("0.5", pkg.ldouble_t)})));
-    ret(0);
-    end();
     expect_output("-1 65535 -100000 -9223372036854775808|   42|42   |-0042|+42|ffff|ABCDEF|"
                   "text z% 2.12 5.000000e-01\n26\n");
 }
@@ -28,8 +25,7 @@ TEST_F(ExecTest, ExitCallsWhatAtexitWasGiven) {
     body();
     put(num(5, pkg.int_t));
     end();
-    begin(main_sym);
-    body();
+    begin_main();
     statement(call(at_exit, node(UAND, pkg.mk_ptr(plain), name(last))));
     statement(call(leave, num(257, pkg.int_t)));
     put(num(6, pkg.int_t));
@@ -43,37 +39,30 @@ TEST_F(ExecTest, ExitCallsWhatAtexitWasGiven) {
 
 TEST_F(ExecTest, AbortIsReported) {
     IC_SYMBOL* stop = library("_abort", {}, pkg.void_t);
-    begin(main_sym);
-    body();
+    begin_main();
     statement(call(stop, nullptr));
-    end();
     expect_error(EXEC_ABORT, "abort");
 }
 
 TEST_F(ExecTest, ReachedUnreachablePlaceIsReported) {
-    begin(main_sym);
-    body();
+    begin_main();
     IC_NODE* mark = node(UMCALL, pkg.void_t);
     mark->text = "_never_executed";
     statement(mark);
-    end();
     expect_error(EXEC_UNREACHABLE, "never executed");
 }
 
 // What hangs on state that no operand shows is refused, not guessed.
 TEST_F(ExecTest, BuiltInFunctionOfHiddenStateIsRefused) {
-    begin(main_sym);
-    body();
+    begin_main();
     IC_NODE* turn = node(MCALL, pkg.long_t, num(1, pkg.long_t));
     turn->text = "__sat";
     statement(turn);
-    end();
     expect_error(EXEC_UNSUPPORTED, "__sat: its result hangs on the overflow counter");
 }
 
 TEST_F(ExecTest, BranchToNoLabelIsReported) {
-    begin(main_sym);
-    body();
+    begin_main();
     statement(node(BRANCH, pkg.int_t, label(12)));
     end();
     const EXEC_RESULT r = run();
@@ -93,7 +82,6 @@ TEST_F(ExecTest, AccessesBeyondAnObjectsMemoryAreReported) {
     body();
     statement(set(p, num((1 << 16) - 2, p->type))); // the last half is outside
     statement(node(ASG, pkg.llong_t, node(UMULT, pkg.llong_t, name(p)), num(1, pkg.llong_t)));
-    end();
     expect_error(EXEC_BAD_ADDRESS, "address");
 }
 } // namespace

@@ -7,20 +7,6 @@ std::string why_refused(const std::string& bytes) {
     return world.read_error(bytes);
 }
 
-TEST(open, header_fields_reach_the_client) {
-    WORLD world;
-    FILE_BUILDER file;
-    file.options = rec(IFR_OPTION_SET, un(3) + un(2) + str("-o2") + str("")) + rec(IFR_OPTION_SET, un(300) + un(0));
-    world.read(file.build());
-    EXPECT_EQ(world.unit.version, -71);
-    EXPECT_EQ(world.unit.cpu, 600);
-    EXPECT_EQ(world.unit.source, "t.c");
-    EXPECT_EQ(world.unit.file()->extra_word, 7);
-    ASSERT_EQ(world.unit.option_sets.size(), 2u);
-    EXPECT_EQ(world.unit.option_sets[0].options, (std::vector<std::string>{"-o2", ""}));
-    EXPECT_EQ(world.unit.option_sets[1].id, 300u);
-}
-
 TEST(open, refused_headers) {
     FILE_BUILDER magic, cpu, longer;
     magic.magic = "!<ocode>\n";
@@ -64,15 +50,6 @@ TEST(open, every_cut_is_reported) {
     std::string whole = file.build();
     EXPECT_EQ(why_refused(whole), "");
     for (size_t size = 0; size < whole.size(); size++) EXPECT_NE(why_refused(whole.substr(0, size)), "") << size;
-}
-
-TEST(open, a_client_may_refuse) {
-    struct : IC_UNIT {
-        bool cl_magic(int, int) override { return false; }
-    } refusing;
-    std::string bytes = FILE_BUILDER().build(), why;
-    EXPECT_EQ(I_FILE::if_open(fmemopen(bytes.data(), bytes.size(), "rb"), &refusing, &why), nullptr);
-    EXPECT_EQ(why, "the header is refused");
 }
 
 } // namespace

@@ -16,27 +16,6 @@ TEST_F(Types, NormalFormOfBasicTypes) {
     EXPECT_EQ(odd->normalized_type(), odd);
 }
 
-TEST_F(Types, NormalFormOfBuiltTypes) {
-    TYPE* td = pkg.mk_typedef("T", false, pkg.uchar_t, 16, 16, false);
-    struct {
-        TYPE *from, *to;
-    } const rows[] = {
-        {td, pkg.uint_t},
-        {pkg.mk_ptr(td), pkg.mk_ptr(pkg.uint_t)},
-        {pkg.mk_qual(td, QUAL_CONST), pkg.mk_qual(pkg.uint_t, QUAL_CONST)},
-        {pkg.mk_array(pkg.mk_ptr(td), false, 3, true), pkg.mk_array(pkg.mk_ptr(pkg.uint_t), false, 3, true)},
-        {pkg.mk_vector(td, false, 4), pkg.mk_vector(pkg.uint_t, false, 4)},
-        {pkg.mk_complex(pkg.short_t), pkg.mk_complex(pkg.int_t)},
-        {function(pkg.short_t, param(td)), function(pkg.int_t, param(td))},
-        {pkg.mk_ptr(pkg.long_t), pkg.mk_ptr(pkg.long_t)},
-    };
-    for (auto& r : rows) {
-        EXPECT_EQ(r.from->normalized_type(), r.to) << r.from->printstr();
-        EXPECT_EQ(r.to->normalized_type(), r.to);
-        EXPECT_TRUE(equiv_mtypes(r.from, r.to));
-    }
-}
-
 TEST_F(Types, Qualifiers) {
     TYPE* c = pkg.mk_qual(pkg.long_t, QUAL_CONST);
     EXPECT_EQ(pkg.mk_qual(c, 0), c);

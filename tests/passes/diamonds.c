@@ -16,14 +16,6 @@ int selected(int x, int y) {
     return r;
 }
 
-// FUNCTION: smaller
-// COUNT 0: if (
-// HAS: /return .*__min\(/
-int smaller(int x, int y) {
-    if (x < y) return x;
-    return y;
-}
-
 // FUNCTION: largest
 // COUNT 1: /__lmax\(/
 int32_t largest(const int32_t *p, int n) {
@@ -116,7 +108,6 @@ int main(void) {
     volatile float zero = 0.0F;
     static const int32_t list[5] = {-70000, 5, 90000, -3, 89999};
     put_i16(selected(4, 10) + selected(3, 10));
-    put_i16(smaller(-5, 4) * 10 + smaller(7, 6));
     put_i32(largest(list, 5));
     for (int i = 6; i < 10; i++) put_i16(bounded(i, i - 8) * 100 + not_the_bound(i));
     put_f32(clipped(-2.0F) + clipped(3.0F));

@@ -183,14 +183,6 @@ int stored_value(struct pair* p, int x) {
     return 1;
 }
 
-// FUNCTION: argument
-// COUNT 1: .b
-int argument(struct pair* p, int x) {
-    p->b = x;
-    put_i32(p->b);
-    return 0;
-}
-
 // FUNCTION: changed_between
 // COUNT 2: .a
 int changed_between(struct pair* p, int* q, int x) {
@@ -222,7 +214,7 @@ int main(void) {
     struct pair two[2] = {{1, 2}, {3, 4}};
     place_moves(two, &at, &r, 6);
     put_i32(two[0].a + two[1].a + q[0] + taken + shared.a);
-    put_i32(stored_value(two, 10) + stored_value(two + 1, 1) + argument(two, 8));
+    put_i32(stored_value(two, 10) + stored_value(two + 1, 1));
     changed_between(two, &two[0].a, 11);
     put_i32(two[0].b);
     put_i32(restricted(&two[0].a, &two[1].a, 7));

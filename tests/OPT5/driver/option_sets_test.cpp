@@ -143,31 +143,19 @@ TEST_F(Flags, FromOptions) {
     };
     const ROW rows[] = {
         {{"-a"}, &alias_vars_option, 1},
-        {{"-a", "-y"}, &alias_vars_option, 1},
         {{"-t"}, &pointer_args_are_disjoint, 1},
         {{"-t"}, &chars_alias_other_types, 0},
         {{"-y"}, &loop_increments_are_not_zero, 1},
         {{"-y"}, &pointer_args_are_disjoint, 0},
         {{"-e"}, &memory_is_big_endian, 1},
-        {{"--endian=big"}, &memory_is_big_endian, 1},
         {{"--endian=little"}, &memory_is_big_endian, 0},
         {{"-p2"}, &program_mode, 2},
-        {{}, &program_mode, -1},
-        {{"--fp_mode=relaxed"}, &strict_fp, 0},
         {{"--fp_mode=strict"}, &strict_fp, 1},
         {{"-du40"}, &max_unrolled_loop_size, 40},
         {{}, &max_unrolled_loop_size, 195},
         {{"-h0"}, &cache_sys_funinfo, 0},
-        {{"-h"}, &cache_sys_funinfo, 1},
-        {{"-v27"}, &cpu_version, 27},
         {{"-vfp64"}, &cpu_version, -1},
-        {{"-j"}, &code_is_reentrant, 0},
-        {{"--rpt_threshold=9"}, &rtc_rpt_threshold, 9},
         {{"--abi=eabi"}, &TYPE_PKG::abi, 1},
-        {{"--abi=legacy"}, &TYPE_PKG::abi, 0},
-        {{"--mem_model:data=flat"}, &TYPE_PKG::flat_memory_model, 1},
-        {{"-dc"}, &old_const_pointer_behavior, 1},
-        {{"-#v"}, &volit_vars, 1},
     };
     for (const ROW& row : rows) {
         set_up({}, row.words);

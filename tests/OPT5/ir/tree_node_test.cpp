@@ -37,42 +37,6 @@ TEST_F(TreeNode, TablesAgreeWithTheFileFormat) {
 
 TEST_F(TreeNode, NodeStaysSmall) { EXPECT_LE(sizeof(NODE), 232u); }
 
-TEST_F(TreeNode, IconTakesTheSignOfItsType) {
-    struct {
-        TYPE* type;
-        int64_t in;
-        INT65 out;
-    } cases[] = {
-        {tp->int_t, -1, -1},
-        {tp->int_t, 65535, -1},
-        {tp->uint_t, -1, 65535},
-        {tp->long_t, 0xFFFFFFFF, -1},
-        {tp->ulong_t, -1, 0xFFFFFFFFu},
-        {tp->llong_t, 0xFFFFFFFF, -1},
-        {tp->ullong_t, -1, 0xFFFFFFFFu},
-    };
-    for (const auto& c : cases) {
-        NODE* t = new_node(ICON, c.type);
-        t->mk_icon(c.in);
-        EXPECT_EQ(t->u.lval, c.out) << c.type->printstr() << " " << c.in;
-        erase_node(t);
-    }
-}
-
-TEST_F(TreeNode, LconKeepsSixtyFourBitsBothWays) {
-    for (const char* text : {"18446744073709551615", "9223372036854775808", "0"}) {
-        NODE* t = new_node(LCON, tp->ullong_t);
-        t->mk_lcon(text);
-        EXPECT_EQ(t->op, ICON);
-        EXPECT_STREQ(t->lcon_value(), text);
-    }
-    NODE* t = new_node(LCON, tp->llong_t);
-    t->mk_lcon("-9223372036854775808");
-    EXPECT_STREQ(t->lcon_value(), "-9223372036854775808");
-    t->mk_lcon("18446744073709551615"); // wrapped into the type
-    EXPECT_EQ(t->u.lval, INT65(-1));
-}
-
 // The text of a float constant gives the same target value to the system's own reader and to any C library.
 TEST_F(TreeNode, FconTextLosesNothing) {
     std::istringstream words("0 1 0.1 3.4028234663852886e38 1.17549435e-38 1e-45 5e-324 2.2250738585072014e-308 "

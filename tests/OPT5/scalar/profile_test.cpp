@@ -57,16 +57,6 @@ TEST_F(ProfileTest, CountsGiveFrequenciesAndProbabilities) {
     EXPECT_NEAR(edge_memberp(block_of(4), block_of(4)->predecessors)->prob, 0.9, 1e-9) << "the edge is still there";
 }
 
-TEST_F(ProfileTest, WithoutDataNothingIsAnnotatedAndTheLayoutStays) {
-    diamond_and_loop();
-    currfuninfo->profile_status = 0;
-    const std::vector<BBLK*> before = layout();
-    initialize_CFG_profiling_annotation(true, true);
-    EXPECT_EQ(block_of(2)->dFreqIn, -1.0);
-    straighten_traces_in_cfg();
-    EXPECT_EQ(layout(), before);
-}
-
 TEST_F(ProfileTest, TheLikelyPathIsLaidOutStraight) {
     diamond_and_loop();
     straighten_traces_in_cfg();

@@ -103,24 +103,6 @@ TEST_F(Target, RegisterSets) {
     EXPECT_TRUE(set.empty());
 }
 
-TEST_F(Target, InstancesFollowVersionAndUnit) {
-    EXPECT_TRUE(find_target_BIF_descriptor("__min")->has(IS_PROPER_MINVAL));
-    EXPECT_FALSE(find_BIF_descriptor("__min")->has(IS_GENERIC));
-    EXPECT_EQ(find_BIF_descriptor("__min")->partner, find_BIF_descriptor("MIN"));
-    EXPECT_EQ(find_target_BIF_descriptor("MINU"), nullptr); // generic, without an instance
-    EXPECT_NE(find_BIF_descriptor("__fmin"), nullptr);
-    EXPECT_EQ(find_BIF_descriptor("__fmin64"), nullptr);
-    EXPECT_EQ(find_target_BIF_descriptor("DISABLE_INTERRUPTS")->name, "__disable_interrupts"); // the last one made
-    start_as(28, 0);
-    EXPECT_EQ(find_BIF_descriptor("__fmin"), nullptr);
-    EXPECT_EQ(find_BIF_descriptor("__sinpuf32"), nullptr);
-    start_as(28, 11);
-    EXPECT_NE(find_BIF_descriptor("__fmax64"), nullptr);
-    start_as(27, 0);
-    EXPECT_EQ(find_BIF_descriptor("__min"), nullptr);
-    EXPECT_NE(find_BIF_descriptor("_enable_interrupts"), nullptr);
-}
-
 TEST_F(Target, ArgumentsTakeTheirParametersTypes) {
     SYMTAB *i = symbol("i", tp->int_t), *l = symbol("l", tp->long_t), *u = symbol("u", tp->uint_t);
     struct {

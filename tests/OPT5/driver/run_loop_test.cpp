@@ -67,14 +67,6 @@ TEST_F(RunLoop, UnsuppressedFunctionTakesPartInTheNextBarrier) {
     EXPECT_EQ(trace, "S 2a 2b 2c B1 3a Wa 3b Wb 3c Wc");
 }
 
-TEST_F(RunLoop, UnsuppressedAfterTheLastBarrierIsWrittenLast) {
-    add_barrier(put_c_to_sleep);
-    add(step_2);
-    add(step_3);
-    run_functions(write_function);
-    EXPECT_EQ(trace, "S 2a 3a Wa 2b 3b Wb 2c 3c Wc");
-}
-
 TEST_F(RunLoop, OneWorkerKeepsTheOrderAndWritesAtTheEnd) {
     add(step_1);
     add_barrier(barrier_1);

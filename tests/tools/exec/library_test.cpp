@@ -37,13 +37,6 @@ TEST_F(ExecTest, ExitCallsWhatAtexitWasGiven) {
     EXPECT_EQ(printed, "5\n");
 }
 
-TEST_F(ExecTest, AbortIsReported) {
-    IC_SYMBOL* stop = library("_abort", {}, pkg.void_t);
-    begin_main();
-    statement(call(stop, nullptr));
-    expect_error(EXEC_ABORT, "abort");
-}
-
 TEST_F(ExecTest, ReachedUnreachablePlaceIsReported) {
     begin_main();
     IC_NODE* mark = node(UMCALL, pkg.void_t);

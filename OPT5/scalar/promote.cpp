@@ -19,6 +19,7 @@
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/exact.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
 
@@ -113,6 +114,7 @@ private:
         default: break;
         }
         if (opcode_is_ASG(t->op)) return assignment(t);
+        if (op_is_int_compare(t->op) && t->right->op == ICON && is_increment(t->left)) return compare_of_old(t);
         operands(t);
         if (op_has_effect(t->op)) blocked = true;
         return t;
@@ -218,6 +220,27 @@ private:
         t->left = t->right = nullptr;
         erase_node(t);
         return simp_node(old, nullptr);
+    }
+
+    static bool is_increment(const NODE* t) { return t->op == PLUSPLUS || t->op == MINMIN; }
+
+    // x-- > c as x >= c of the new x: the step of a signed variable is exact, and so is the old value as a sum, which
+    // the compare need not make then.
+    NODE* compare_of_old(NODE* t) {
+        operands(t);
+        NODE *old = t->left, *c = t->right;
+        if ((old->op != PLUS && old->op != MINUS) || old->left->op != NAME || old->right->op != ICON ||
+            !is_exact_by_rule(old->op, old->type) || !equiv_mtypes(old->type, c->type) || t->op > GT)
+            return t;
+        const INT65 step = old->right->u.lval, moved = old->op == PLUS ? c->u.lval - step : c->u.lval + step;
+        if (truncate_to_type(moved, c->type) != moved) return t;
+        const bool against_zero = moved == INT65(-1) && (t->op == LE || t->op == GT);
+        c->u.lval = against_zero ? INT65(0) : moved;
+        if (against_zero) t->op = t->op == LE ? LT : GE;
+        t->left = old->left;
+        old->left = nullptr;
+        erase_tree(old);
+        return simp_node(t, nullptr);
     }
 
     NODE* saved_value(NODE* t) {

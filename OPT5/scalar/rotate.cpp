@@ -15,6 +15,7 @@
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
+#include <cstdlib>
 #include <unordered_set>
 #include <vector>
 
@@ -209,6 +210,21 @@ void take_copy(BBLK* bb, BBLK* head, const NODE* test) {
     fixup_edge_lists(bb, last->first);
 }
 
+bool promises_an_iteration(const BBLK* bb) {
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        const PRAGMA* p = s->first->op == PPRAGMA ? s->first->pragma : nullptr;
+        if (p && p->kind == PRG_MUST_ITERATE && !p->args.empty() && std::strtoll(p->args[0].c_str(), nullptr, 10) > 0)
+            return true;
+    }
+    return false;
+}
+
+void enter_at_body(BBLK* ahead, BBLK* head, BBLK* body) {
+    subst_bb_for_bb_in_bb(body, head, ahead);
+    disconnect(ahead, head);
+    connect(ahead, body);
+}
+
 // A copy of the test takes the jump's place: one conditional branch in each iteration instead of a test and a jump.
 // True if a test is reached no more.
 bool close_loops_by_tests() {
@@ -222,8 +238,12 @@ bool close_loops_by_tests() {
         TEST_TAKERS takers;
         if (!find_takers(loops, head, &takers) || takers.back.empty()) continue;
         if (BBLK* ahead = takers.promising) {
-            if (!put_behind_promise(ahead, body_behind_test(loops, loop.get(), test))) continue;
-            take_copy(ahead, loop->header, test);
+            BBLK* body = body_behind_test(loops, loop.get(), test);
+            if (!put_behind_promise(ahead, body)) continue;
+            if (promises_an_iteration(ahead))
+                enter_at_body(ahead, loop->header, body);
+            else
+                take_copy(ahead, loop->header, test);
         }
         for (BBLK* bb : takers.back) take_copy(bb, loop->header, test);
         unreached |= !head->predecessors;

@@ -34,7 +34,7 @@ int32_t largest(const int32_t *p, int n) {
 // COUNT 1: = ABS(e)
 int peaks(const int *p, int n) {
     int m = -9, e, sum = 0;
-    while (n-- > 0) {
+    while (n-- > 1) {
         if (*p > m) m = *p;
         e = *p++ - 6;
         if (e < 0) e = -e;

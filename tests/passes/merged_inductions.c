@@ -149,11 +149,11 @@ long kept_aliased(int n) {
     return s;
 }
 
-// What is promised of a loop stands right ahead of it.
+// What is promised of a loop stands right ahead of it, and of an iteration that is promised no test asks.
 // FUNCTION: promised
 // HAS: $O$P0 = &_w
 // HAS: /^pragma 39 MUST_ITERATE/
-// HAS: /goto L2$/
+// NOT: goto
 // HAS: L1:
 long promised(int n) {
     long s = 0;

@@ -25,6 +25,7 @@ long two_loops(int n) {
 // NOT: /j \+= 1/
 // HAS: /k \+= 1/
 // HAS: /MUST_ITERATE\("", "4"/
+// HAS: /j < n.* goto/
 // NOT: /k \+= 1/
 // HAS: /j \+= 1/
 long nested(int n) {

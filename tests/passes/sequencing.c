@@ -87,6 +87,26 @@ int unordered(float x) { return !(x < 3.0F); }
 // COUNT 1: !=
 int equal(float x) { return !(x == 3.0F); }
 
+// A test of the value before a step asks the one behind it; where the moved limit would wrap, and of what wraps itself,
+// it cannot.
+// FUNCTION: counted_down
+// HAS: n -= 1
+// HAS: /n < 0/
+// HAS: m += 1
+// HAS: /m >= 13/
+// HAS: k += 1
+// HAS: /k - 1 /
+// HAS: u -= 1
+// HAS: /u \+ 1 /
+int counted_down(int n, int m, int k, unsigned u) {
+    int s = 0;
+    while (n-- > 0) s += g;
+    while (m++ < 12) s -= h;
+    if (k++ < 32767) s += k;
+    if (u-- > 5) s += 3;
+    return s + k;
+}
+
 int main(void) {
     commas();
     put_i16(g + h);
@@ -108,5 +128,6 @@ int main(void) {
     put_i16(branch(4) * 10 + branch(5));
     put_i16(unordered(2.0F) * 100 + unordered(3.0F) * 10 + unordered(zero / zero));
     put_i16(equal(3.0F) * 10 + equal(zero / zero));
+    for (int i = -1; i < 2; i++) put_i16(counted_down(i, i + 11, 32767 - 2 * (i & 1), i + 5));
     return 0;
 }

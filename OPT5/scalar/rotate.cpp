@@ -15,7 +15,6 @@
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <unordered_set>
 #include <vector>
 
@@ -153,30 +152,31 @@ bool ends_in_jump_to(const BBLK* bb, const BBLK* target) {
     return control && control->op == BRANCH && control->left->lbl->bblock == target && !bb->is_in_LIR_form();
 }
 
-// The loop's blocks that jump back to a test on top of it, and are to test for themselves.
+// The blocks that jump to a test on top of a loop, and are to test for themselves.
 struct TEST_TAKERS {
     std::vector<BBLK*> back;
-    BBLK* promising = nullptr; // the one block ahead of the loop, if it holds a promise about the loop
+    BBLK* ahead = nullptr;     // the one that leads into the loop, where all take the test
+    BBLK* promising = nullptr; // the same, if it holds a promise about the loop
 };
 
 // A promise must be followed by the label of its loop: by the body's, if all who come to the test take a copy, the
 // block ahead too, so that no label is left at the test.
 bool find_takers(const NATURAL_LOOPS& loops, const BBLK* head, TEST_TAKERS* takers) {
     bool promises = false, all_jump = true;
-    int ahead = 0;
+    std::vector<BBLK*> ahead;
     for (const EDGE* e = head->predecessors; e; e = e->rest) {
-        BBLK* bb = e->first;
-        const bool is_back = loops.dominates(head, bb), jumps = ends_in_jump_to(bb, head);
-        if (is_back && jumps) takers->back.push_back(bb);
-        if (ends_in_promise(bb)) {
-            promises = true;
-            takers->promising = bb;
-        }
-        ahead += !is_back;
+        const bool is_back = loops.dominates(head, e->first), jumps = ends_in_jump_to(e->first, head);
+        if (is_back && jumps) takers->back.push_back(e->first);
+        if (!is_back) ahead.push_back(e->first);
+        promises |= ends_in_promise(e->first);
         all_jump &= jumps;
     }
+    if (takers->back.empty()) return false;
+    if (!all_jump || ahead.size() != 1) return !promises;
+    takers->ahead = ahead.front();
     if (!promises) return true;
-    return all_jump && ahead == 1 && !loops.dominates(head, takers->promising);
+    takers->promising = takers->ahead;
+    return ends_in_promise(takers->promising);
 }
 
 // Puts `first`, and what must stand behind it, behind `promising`; false where that cannot be.
@@ -210,21 +210,6 @@ void take_copy(BBLK* bb, BBLK* head, const NODE* test) {
     fixup_edge_lists(bb, last->first);
 }
 
-bool promises_an_iteration(const BBLK* bb) {
-    for (const LIST* s = bb->statements; s; s = s->rest) {
-        const PRAGMA* p = s->first->op == PPRAGMA ? s->first->pragma : nullptr;
-        if (p && p->kind == PRG_MUST_ITERATE && !p->args.empty() && std::strtoll(p->args[0].c_str(), nullptr, 10) > 0)
-            return true;
-    }
-    return false;
-}
-
-void enter_at_body(BBLK* ahead, BBLK* head, BBLK* body) {
-    subst_bb_for_bb_in_bb(body, head, ahead);
-    disconnect(ahead, head);
-    connect(ahead, body);
-}
-
 // A copy of the test takes the jump's place: one conditional branch in each iteration instead of a test and a jump.
 // True if a test is reached no more.
 bool close_loops_by_tests() {
@@ -236,15 +221,10 @@ bool close_loops_by_tests() {
         const NODE* test = test_on_top(head);
         if (!test || head == currfuninfo->bb_list) continue;
         TEST_TAKERS takers;
-        if (!find_takers(loops, head, &takers) || takers.back.empty()) continue;
-        if (BBLK* ahead = takers.promising) {
-            BBLK* body = body_behind_test(loops, loop.get(), test);
-            if (!put_behind_promise(ahead, body)) continue;
-            if (promises_an_iteration(ahead))
-                enter_at_body(ahead, loop->header, body);
-            else
-                take_copy(ahead, loop->header, test);
-        }
+        if (!find_takers(loops, head, &takers)) continue;
+        if (takers.promising && !put_behind_promise(takers.promising, body_behind_test(loops, loop.get(), test)))
+            continue;
+        if (takers.ahead) take_copy(takers.ahead, loop->header, test);
         for (BBLK* bb : takers.back) take_copy(bb, loop->header, test);
         unreached |= !head->predecessors;
     }

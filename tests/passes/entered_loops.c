@@ -27,6 +27,71 @@ int between(const int *from) {
     return s;
 }
 
+// The condition that chooses the limit is the first test, and then the limit needs no choice; unless it is read behind
+// the loop, or its other value does not end the loop.
+// FUNCTION: chosen
+// HAS: end = p + n
+// HAS: /^if \(!\(n > 2\)\)/
+// NOT: ?
+int chosen(const int *p, int n) {
+    const int *end = n > 2 ? p + n : p;
+    int s = 0;
+    while (p != end) s = s * 3 + *p++;
+    return s;
+}
+
+// FUNCTION: read_behind
+// COUNT 1: n > 2 ? p + n : p
+int read_behind(const int *p, int n) {
+    const int *end = n > 2 ? p + n : p;
+    int s = 0;
+    while (p != end) s = s * 3 + *p++;
+    return s + (end == g);
+}
+
+// FUNCTION: other_limit
+// COUNT 1: n > 2 ? p + n : p + 1
+int other_limit(const int *p, int n) {
+    const int *end = n > 2 ? p + n : p + 1;
+    int s = 0;
+    while (p != end) s = s * 3 + *p++;
+    return s;
+}
+
+// FUNCTION: changed_condition
+// COUNT 1: n > 2 ? p + n : p
+int changed_condition(const int *p, int n) {
+    int s = 0;
+    for (int k = 0; k < 3; k++) {
+        const int *at = p, *end = n > 2 ? p + n : p;
+        n = g[k];
+        while (at != end) s = s * n + *at++;
+    }
+    return s;
+}
+
+// An earlier test decides the first one of an inner loop, as long as nothing changes what it asks.
+// FUNCTION: triangle
+// COUNT 1: i < n
+// COUNT 0: j < n
+int triangle(int n) {
+    int s = 0;
+    for (int i = 0; i < n; i++)
+        for (int j = i; j < n; j++) s = s * 3 + j;
+    return s;
+}
+
+// FUNCTION: moved
+// COUNT 1: j < n
+int moved(int n) {
+    int s = 0;
+    for (int i = 0; i < n; i++) {
+        n -= g[i];
+        for (int j = i; j < n; j++) s = s * 3 + j;
+    }
+    return s;
+}
+
 // What the loop starts from is not known here: a call, an assembly text or a pointer may have changed it.
 // FUNCTION: unknown
 // COUNT 1: if (!(_n < 5)
@@ -75,6 +140,12 @@ int main(void) {
     put_i16(between(g));
     put_i16(stepped(1));
     put_i32(promised(4, p));
+    for (int i = 0; i < 5; i++) {
+        g[i] = i * 7 - 5;
+        put_i16(chosen(g, i) + read_behind(g, i));
+        put_i16(other_limit(g, i) + changed_condition(g, i));
+        put_i16(triangle(i) + moved(i));
+    }
     put_i16(g[3] + g[4] + n);
     return 0;
 }

@@ -6,11 +6,11 @@
 int g[8];
 
 // FUNCTION: nested
-// HAS: /^if .* goto L6/
-// HAS: /^if .* goto L5/
-// HAS: L4:
 // HAS: /^if .* goto L4/
+// HAS: /^if .* goto L3/
+// HAS: L2:
 // HAS: /^if .* goto L2/
+// HAS: /^if .* goto L1/
 // COUNT 0: /^goto/
 int nested(int n) {
     int sum = 0, i, j;

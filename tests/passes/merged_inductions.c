@@ -10,8 +10,8 @@ long m[8][8], w[64];
 // HAS: s += *$O$P0 * *$O$P1
 // HAS: $O$P0 += 1
 // NOT: i
-// HAS: if (!($O$P0 == $O$P2)) goto L2
-// COUNT 1: n > 0 ? x + n : x
+// HAS: if (!($O$P0 == $O$P2)) goto L1
+// COUNT 0: n > 0 ? x + n : x
 int dot(const int *x, const int *y, int n) {
     int s = 0;
     for (int i = 0; i < n; i++) s += x[i] * y[i];

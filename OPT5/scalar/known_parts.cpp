@@ -49,7 +49,9 @@ public:
         if (!last || !before || before->rest || before->first != last) forget_all();
         for (LIST* s = bb->statements; s; s = s->rest) {
             NODE* t = s->first;
+            any = false;
             if (!known.empty()) reuse(t);
+            if (any) s->first = t = simp_tree(t, nullptr);
             forget_modified(t);
             learn(t);
         }
@@ -96,6 +98,7 @@ private:
                 if (equiv_mtypes(k.lvalue->type, t->type) && trees_are_congruent(k.lvalue, t, false)) {
                     NODE* value = copy_tree(k.value);
                     erase_tree(t);
+                    any = true;
                     return value;
                 }
         if (t->op == UAND || t->op == ARGREF) {
@@ -144,6 +147,7 @@ private:
     }
 
     std::vector<KNOWN> known;
+    bool any = false; // replaced in the statement in work
     const BBLK* last = nullptr; // the block that `known` holds behind
 };
 

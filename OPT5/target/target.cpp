@@ -125,7 +125,26 @@ NODE* address_of_member(NODE* t) {
     return offset.is_zero() ? address : maketree(PLUS, address, mk_ICON(offset, tp->long_t), type, address->ls);
 }
 
+// A displacement from an address that has one itself, between casts of pointers or not: their sum.
+NODE* with_one_displacement(NODE* t) {
+    NODE* inner = t->left;
+    while (inner->op == PCONV && inner->left->type->is_pointer()) inner = inner->left;
+    if (inner->op != PLUS || !inner->type->is_pointer() || inner->right->op != ICON) return t;
+    const INT65 sum = inner->right->u.lval + t->right->u.lval;
+    if (!offset_is_in_range(sum, t->type, 0)) return t;
+    erase_tree(t->right);
+    t->right = mk_ICON(sum, tp->long_t);
+    NODE* base = inner->left;
+    erase_tree(inner->right);
+    NODE** link = &t->left;
+    while (*link != inner) link = &(*link)->left;
+    *link = coerce_to_type(inner->type, base);
+    erase_node(inner);
+    return t;
+}
+
 NODE* lower_address(NODE* t) {
+    if (t->op == PLUS && t->type->is_pointer() && t->right->op == ICON) return with_one_displacement(t);
     if (t->op == STREF && t->left->type->is_pointer()) {
         t->op = STDOT;
         t->left = maketree(UMULT, t->left, nullptr, t->left->type->type_pointed_to(), t->ls);

@@ -99,6 +99,9 @@ private:
     int questions_left = 16; // each looks at the whole loop
 };
 
+// Makes two inductions one that are equal throughout the loop (equal_inductions.cpp); whether it found two. `facts` is then
+// stale.
+bool unite_equal_inductions(const NATURAL_LOOPS& all, NATURAL_LOOP* loop, LOOP_FACTS& facts);
 // Whether only its NAME reads and writes a local scalar.
 bool is_private_scalar(const SYMTAB* sym);
 // The constant trip count that a test allows, or -1; `first` gets the counter's value at the first test that

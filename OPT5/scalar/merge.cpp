@@ -143,6 +143,7 @@ public:
     ~MERGE() {
         for (NODE* t : replaced) erase_tree(t);
     }
+    bool unite() { return unite_equal_inductions(loops, loop, facts); }
     void run();
 
 private:
@@ -573,7 +574,12 @@ void merge_symbols() {
     NATURAL_LOOPS& loops = *currfuninfo->loops;
     if (currfuninfo->lva_sym_count) eliminate_single_use_temps();
     for (const auto& loop : loops.inner_first())
-        if (loop->inside < DEEPEST) MERGE(loops, loop.get()).run();
+        while (loop->inside < DEEPEST) {
+            MERGE merge(loops, loop.get());
+            if (merge.unite()) continue; // what was known of the loop is stale
+            merge.run();
+            break;
+        }
     if (loops.has_split_edges()) renumber_bblocks();
     changed(fact::none);
 }

@@ -192,6 +192,29 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
     for (int i = 0; i < n; i++) y[i] = x[i] * x[i + 1];
 }
 
+// Two counters of one value are one, which may be read behind the loop; a use between their steps sees them differ.
+// FUNCTION: together
+// COUNT 0: p +=
+// COUNT 1: i += 1
+int together(const int *x, int n) {
+    int i = 0, p = 0, s = 0;
+    while (i < n) s = s * 3 + x[i] + (p & 3), i++, p++;
+    return s + i;
+}
+
+// FUNCTION: apart
+// COUNT 1: k += 1
+// COUNT 1: p += 1
+int apart(const int *x, int n) {
+    int k = n, p = n, s = 0;
+    do {
+        k++;
+        s = s * 3 + x[p & 7] * k;
+        p++;
+    } while (s < 999 && k < 99);
+    return s;
+}
+
 int main(void) {
     for (int i = 0; i < 300; i++) a[i] = i ^ 5, b[i] = 300 - i;
     for (int i = 0; i < 64; i++) w[i] = i * 7L, next[i] = i % 3 + 1, m[i / 8][i % 8] = i;
@@ -211,5 +234,6 @@ int main(void) {
     put_i32(changing_steps(60) + tested_late(-1UL, 5) * 7 + tested_late(9, 5));
     kept_apart(a, b, 30);
     put_i16(b[29] + b[3]);
+    put_i16(together(a, 9) + together(a, 0) + apart(a, 5));
     return 0;
 }

@@ -6,16 +6,6 @@ int g;
 volatile int v;
 static int step(int by) { return g += by; }
 
-// FUNCTION: overwritten
-// COUNT 0: = 1
-// HAS: /x = y \+ 2|return/
-int overwritten(int y) {
-    int x = 1;
-    g = y;
-    x = y + 2;
-    return x * g;
-}
-
 // FUNCTION: effects
 // COUNT 1: _step(
 // COUNT 1: /_v/
@@ -24,20 +14,6 @@ void effects(void) {
     int unused = step(3);
     unused = v;
     unused += 4;
-}
-
-// FUNCTION: on_one_way
-// HAS: /if .*goto/
-// HAS: /x = .*y \* 3/
-// HAS: /L\d+:/
-int on_one_way(int y) {
-    int x = y * 3;
-    if (y > 100) {
-        g = x;
-        return 1;
-    }
-    g = y;
-    return 2;
 }
 
 // Counters that feed themselves, and a ring; one that a call and one that the result needs stay.
@@ -117,10 +93,8 @@ int old_value(int y) {
 int not_past_a_read(void) { return g + step(1); }
 
 int main(void) {
-    put_i16(overwritten(4));
     effects();
     put_i16(g);
-    put_i16(on_one_way(101) + on_one_way(5));
     put_i16(conditional(4) * 10 + conditional(3));
     put_i16(under_a_condition(2) * 100 + under_a_condition(8));
     put_i16(address_taken(9));

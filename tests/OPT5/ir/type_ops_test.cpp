@@ -61,37 +61,6 @@ TEST_F(TypeOps, PointerCastsGoDownAndUp) {
     EXPECT_EQ(t->left->type, p->type);
 }
 
-TEST_F(TypeOps, AssignmentsAreNormalized) {
-    SYMTAB *a = symbol("a", tp->int_t), *b = symbol("b", tp->int_t),
-           *v = symbol("v", tp->mk_qual(tp->int_t, QUAL_VOLATILE));
-    SYMTAB *r = symbol("r", tp->int_t, 2, SC_REGISTER), *same = symbol("r2", tp->int_t, 2, SC_REGISTER);
-    SYMTAB* other = symbol("r3", tp->int_t, 2, SC_REGISTER2);
-    r->value = same->value = other->value = 5;
-    NODE* s_bits = member(name(symbol("s", sample_struct())), sample_member(1));
-    struct {
-        NODE* tree;
-        const char* text;
-    } cases[] = {
-        {bin(ASG, name(a), name(a)), "a"},
-        {bin(ASG, name(v), name(v)), "v = v"},
-        {bin(ASG, name(a), bin(ASG, name(a), name(b))), "a = b"},
-        {bin(ASG, name(a), bin(PLUS, name(b), name(a))), "a += b"},
-        {bin(ASG, name(a), bin(PLUS, call("f", tp->int_t), name(a))), "a = f() + a"},
-        {bin(ASG, name(a), bin(PLUS, name(a), call("f", tp->int_t))), "a = a + f()"},
-        {bin(ASG, name(a), bin(SRL, name(a), icon(1))), "a >>= 1"},
-        {bin(ASG, name(v), bin(PLUS, name(v), icon(1))), "v = v + 1"},
-        {bin(ASG, name(r), bin(MINUS, name(same), icon(1))), "r -= 1"},
-        {bin(ASG, name(r), bin(MINUS, name(other), icon(1))), "r = r3 - 1"},
-        {bin(ASG, copy_tree(s_bits), bin(PLUS, copy_tree(s_bits), icon(1, tp->uint_t))),
-         "s.bits = (unsigned int)s.bits + 1u"},
-    };
-    for (const auto& c : cases) {
-        NODE* t = insert_mandatory_casts(c.tree);
-        EXPECT_EQ(show(t), c.text);
-        EXPECT_EQ(show(insert_mandatory_casts(t)), c.text) << "twice";
-    }
-}
-
 // Whatever the widened type of a variable: reads convert back, and the variable itself never stands under a cast on the
 // left.
 TEST_F(TypeOps, NamesFollowTheirSymbol) {

@@ -46,25 +46,12 @@ protected:
         prolog = prolog ? maketree(PCOMMA, prolog, asg, tp->void_t) : asg;
         return copy;
     }
-    // struct { int a; long b; }
-    static TYPE* pair() {
-        static TYPE* made_type = nullptr;
-        if (made_type) return made_type;
-        TYPE* t = tp->mk_struct("pair", 64, 32, false);
-        auto* a = new fkMDATA("a", tp->int_t, 0, 0, 0, false, false, false, false);
-        a->next = new fkMDATA("b", tp->long_t, 0, 32, 0, false, false, false, false);
-        tp->set_mdata(t, a);
-        tp->type_frozen(t);
-        return made_type = t;
-    }
-
     // ---- Trees; those that a test asks about are freed at its end
     NODE* keep(NODE* t) {
         made.push_back(t);
         return t;
     }
     static NODE* name(SYMTAB* s) { return mk_NAME(s, LS::current()); }
-    static NODE* icon(long v) { return mk_ICON(INT65(v), tp->int_t); }
     static NODE* sum(NODE* a, NODE* b) {
         TYPE* type =
             a->type->is_pointer() ? a->type : operator_type_for_operand_types(PLUS, a->type, b->type, nullptr, nullptr);

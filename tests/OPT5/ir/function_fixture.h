@@ -13,6 +13,7 @@
 
 #include <map>
 #include <memory>
+#include <string>
 #include <vector>
 
 class FunctionTest : public testing::Test {
@@ -69,6 +70,20 @@ protected:
         return s;
     }
 
+    // struct { int a; long b; }
+    static TYPE* pair() {
+        static TYPE* made = nullptr;
+        if (made) return made;
+        TYPE* t = tp->mk_struct("pair", 64, 32, false);
+        auto* a = new fkMDATA("a", tp->int_t, 0, 0, 0, false, false, false, false);
+        a->next = new fkMDATA("b", tp->long_t, 0, 32, 0, false, false, false, false);
+        tp->set_mdata(t, a);
+        tp->type_frozen(t);
+        return made = t;
+    }
+    static NODE* icon(long v, TYPE* type = tp->int_t) { return mk_ICON(INT65(v), type); }
+    static NODE* address(SYMTAB* s) { return maketree(UAND, mk_NAME(s), nullptr, tp->mk_ptr(s->type)); }
+
     // ---- Statements, in source order
     LBL* label(int n) {
         LBL*& lbl = labels[n];
@@ -88,6 +103,14 @@ protected:
     void branch_if(SYMTAB* cond, int if_true, int if_false) { add(mk_IF(mk_NAME(cond), ref(if_true), ref(if_false))); }
     void assign(SYMTAB* to, long value) { add(mk_ASG(mk_NAME(to), mk_ICON(INT65(value), to->type))); }
     void ret(SYMTAB* value) { add(maketree(RETURN, mk_NAME(currfunc), mk_NAME(value), tp->int_t)); }
+
+    // The text of all, in the order of the blocks.
+    static std::string statements() {
+        std::string all;
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (const LIST* s = bb->statements; s; s = s->rest) all += stmt2infix(s->first) + " ";
+        return all;
+    }
 
     // The block that a label starts, null if it is gone.
     static BBLK* block_of(int n) {

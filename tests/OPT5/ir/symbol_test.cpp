@@ -65,7 +65,6 @@ TEST_F(SymbolTest, DeclarationsFindTheirDefinition) {
 
 class AutoinitTest : public SymbolTest {
 protected:
-    static NODE* icon(long v, TYPE* type = tp->int_t) { return mk_ICON(INT65(v), type); }
     static NODE* skip(uint32_t n) {
         NODE* t = new_node(SKIP, tp->int_t);
         t->mk_skip(n);
@@ -108,12 +107,7 @@ TEST_F(AutoinitTest, ArraysAndSkips) {
 }
 
 TEST_F(AutoinitTest, StructuresInLayoutOrderAndNothingBehindAUnion) {
-    TYPE* pair = tp->mk_struct("pair", 64, 32, false);
-    auto* a = new fkMDATA("a", tp->int_t, 0, 0, 0, false, false, false, false);
-    auto* b = new fkMDATA("b", tp->long_t, 0, 32, 0, false, false, false, false);
-    a->next = b;
-    tp->set_mdata(pair, a);
-    tp->type_frozen(pair);
+    TYPE* pair = this->pair();
     SYMTAB* s = object(tp->mk_array(pair, false, 2, true),
                        {icon(1), icon(70000, tp->long_t), icon(2), icon(80000, tp->long_t)});
     EXPECT_EQ(value_at(s, 32, tp->long_t), 70000);

@@ -8,16 +8,6 @@ namespace {
 
 class CsuTemp : public FunctionTest {
 protected:
-    static TYPE* pair() {
-        static TYPE* made = nullptr;
-        if (made) return made;
-        TYPE* t = tp->mk_struct("returned_pair", 64, 32, false);
-        auto* a = new fkMDATA("a", tp->int_t, 0, 0, 0, false, false, false, false);
-        a->next = new fkMDATA("b", tp->long_t, 0, 32, 0, false, false, false, false);
-        tp->set_mdata(t, a);
-        tp->type_frozen(t);
-        return made = t;
-    }
     void SetUp() override {
         FunctionTest::SetUp();
         pointer = local("hidden", tp->mk_ptr(pair()));
@@ -53,10 +43,7 @@ protected:
         build();
         sym_split(currfuninfo);
         subst_csu_returning_temp_for_local_var();
-        std::string text;
-        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            for (const LIST* s = bb->statements; s; s = s->rest) text += stmt2infix(s->first) + "\n";
-        return text;
+        return statements();
     }
     bool stays() { return symbol_in_list(result, currfuninfo->memory_syms); }
 

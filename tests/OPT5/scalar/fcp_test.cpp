@@ -24,20 +24,12 @@ protected:
         FunctionTest::TearDown();
     }
     void set(SYMTAB* to, NODE* value) { add(maketree(ASG, mk_NAME(to), value, to->type)); }
-    static NODE* icon(long v) { return mk_ICON(INT65(v), tp->int_t); }
-    static NODE* address(SYMTAB* s) { return maketree(UAND, mk_NAME(s), nullptr, tp->mk_ptr(s->type)); }
     // A value that may be another one each time.
     NODE* fresh() {
         SYMTAB* f = make_symbol("_f", function_type(), SC_EXTERN, 0);
         return maketree(UCALL, maketree(UAND, mk_NAME(f), nullptr, tp->mk_ptr(f->type)), nullptr, tp->int_t);
     }
-    static std::string text() {
-        std::string all;
-        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            for (LIST* s = bb->statements; s; s = s->rest) all += stmt2infix(s->first) + "; ";
-        return all;
-    }
-    static bool says(const std::string& part) { return text().find(part) != std::string::npos; }
+    static bool says(const std::string& part) { return statements().find(part) != std::string::npos; }
 };
 
 TEST_F(FcpTest, CleanUpCodeKeepsItsVariables) {
@@ -50,8 +42,8 @@ TEST_F(FcpTest, CleanUpCodeKeepsItsVariables) {
     currfuninfo->eht[1].cleanup = maketree(PLUS, mk_NAME(x), icon(1), tp->int_t);
     build();
     fast_CP(4, 0);
-    EXPECT_TRUE(says("x = 1")) << text();
-    EXPECT_FALSE(says("y")) << text();
+    EXPECT_TRUE(says("x = 1")) << statements();
+    EXPECT_FALSE(says("y")) << statements();
     EXPECT_TRUE(valid());
 }
 
@@ -62,7 +54,7 @@ TEST_F(FcpTest, TheExtentOfAnArrayKeepsItsVariable) {
     ret(n);
     build();
     fast_CP(4, 0);
-    EXPECT_TRUE(says("n = 7")) << text();
+    EXPECT_TRUE(says("n = 7")) << statements();
     erase_tree(a->size_tree);
     a->size_tree = nullptr;
 }
@@ -81,7 +73,7 @@ TEST_F(FcpTest, AnEntryThatALoopReturnsToRunsMoreThanOnce) {
     ret(y);
     build();
     fast_CP(4, 0);
-    EXPECT_TRUE(says("y = x")) << text();
+    EXPECT_TRUE(says("y = x")) << statements();
 }
 
 TEST_F(FcpTest, WhatRestrictSaysStaysWithItsVariable) {
@@ -96,8 +88,8 @@ TEST_F(FcpTest, WhatRestrictSaysStaysWithItsVariable) {
     ret(x);
     build();
     fast_CP(4, 0);
-    EXPECT_TRUE(says("x = *own")) << text();
-    EXPECT_FALSE(says("fixed")) << text();
+    EXPECT_TRUE(says("x = *own")) << statements();
+    EXPECT_FALSE(says("fixed")) << statements();
 }
 
 TEST_F(FcpTest, GlobalsThatNeverChange) {
@@ -151,8 +143,8 @@ TEST_F(FcpTest, CountersLoseTheStepsThatNoOneReads) {
     elim_locally_dead_assignments_in_bb(currfuninfo->bb_list, loop);
     lva_cleanup();
     is_loop_counter = nullptr;
-    EXPECT_TRUE(says("i += 1") && says("k += 3")) << text();
-    EXPECT_FALSE(says("i += 2")) << text();
+    EXPECT_TRUE(says("i += 1") && says("k += 3")) << statements();
+    EXPECT_FALSE(says("i += 2")) << statements();
     EXPECT_TRUE(valid());
 }
 

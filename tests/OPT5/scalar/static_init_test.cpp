@@ -41,7 +41,6 @@ protected:
         NODE* at = n ? maketree(PLUS, start, mk_ICON(INT65(n), tp->long_t), pointer) : start;
         return maketree(UMULT, at, nullptr, array->type->raw_elem_type());
     }
-    static NODE* icon(long v, TYPE* type = tp->int_t) { return mk_ICON(INT65(v), type); }
     void call() {
         SYMTAB* f = global("_f", function_type());
         f->sclass = SC_EXTERN;
@@ -51,12 +50,6 @@ protected:
         add(maketree(URETURN, mk_NAME(currfunc), nullptr, tp->void_t));
         build();
         convert_sti_to_cinit();
-    }
-    static std::string statements() {
-        std::string all;
-        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            for (const LIST* s = bb->statements; s; s = s->rest) all += stmt2infix(s->first) + " ";
-        return all;
     }
     static std::string items(const SYMTAB* s) {
         std::string all;

@@ -1,4 +1,5 @@
-// Conditional paths: a test whose outcome is known on some of the edges into its block, behind a few statements of its own.
+// Conditional paths: a test whose outcome is known on some of the edges into its block, behind a few statements of its
+// own.
 //
 //     if (c) A; T; if (c) B;     becomes     if (c) { A; T; B } else { T }
 //
@@ -22,7 +23,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/implied_tests.h"
-#include "OPT5/scalar/lowering.h"
+#include "OPT5/scalar/tail_copies.h"
 #include "OPT5/simp/seq.h"
 
 #include <algorithm>
@@ -32,10 +33,7 @@ register_option pass_disable_cps("disable:cps");
 
 namespace {
 
-constexpr int LARGEST_TAIL = 24;      // nodes of what is copied
-constexpr int LEAST_GROWTH = 64;      // nodes that any function may grow by
-constexpr int SHARE_OF_FUNCTION = 12; // and beyond that one in so many of its own
-constexpr int MOST_PASSES = 4;        // a test behind a copied one may be decided by that
+constexpr int MOST_PASSES = 4; // a test behind a copied one may be decided by that
 constexpr int SPEED_MATTERS = 3;
 
 struct CANDIDATE {
@@ -43,37 +41,6 @@ struct CANDIDATE {
     std::vector<DECIDED_EDGE> edges;
     bool all; // no other edge leads into the block
 };
-
-bool may_be_copied(NODE* t) {
-    switch (t->op) {
-    case PPRAGMA:
-    case ASM:
-    case LABELDEF:
-    case LOOP:
-    case PCOMMA:
-    case ASSERT:
-    case NASSERT: return false;
-    default: return !tree_contains_op(t, ASM) && !tree_is_arg_prolog(t) && !calls_setjmp(t);
-    }
-}
-
-// The nodes of a block's statements, or -1 for what is too large or must stay single.
-int nodes_of_tail(const BBLK* bb) {
-    int nodes = 0;
-    for (const LIST* s = bb->statements; s->rest; s = s->rest) {
-        if (!may_be_copied(s->first)) return -1;
-        nodes += count_nodes_in_tree(s->first);
-        if (nodes > LARGEST_TAIL) return -1;
-    }
-    return nodes;
-}
-
-int nodes_of_function() {
-    int nodes = 0;
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest) nodes += count_nodes_in_tree(s->first);
-    return nodes;
-}
 
 class COND_PATHS {
 public:
@@ -132,7 +99,8 @@ private:
         return !c.edges.empty();
     }
 
-    // The edges of each outcome share a copy; where every edge is decided, those of the first outcome keep the block itself.
+    // The edges of each outcome share a copy; where every edge is decided, those of the first outcome keep the block
+    // itself.
     bool combine(const CANDIDATE& c) {
         const bool first = c.edges.front().outcome;
         const bool agree = std::all_of(c.edges.begin(), c.edges.end(), [&](auto& e) { return e.outcome == first; });
@@ -154,11 +122,7 @@ private:
     }
 
     static BBLK* copy_tail(BBLK* bb, BBLK* to) {
-        LIST *tail = nullptr, **end = &tail;
-        const LIST* s = bb->statements;
-        for (; s->rest; s = s->rest, end = &(*end)->rest) *end = mkelist(copy_tree(s->first), nullptr, s->psn);
-        *end = mkelist(mk_BRANCH(to), nullptr, s->psn);
-        BBLK* copy = insert_new_bb(-1, bb, tail);
+        BBLK* copy = insert_new_bb(-1, bb, copy_of_tail(bb, mk_BRANCH(to)));
         connect(copy, to);
         return copy;
     }
@@ -179,7 +143,7 @@ void straighten_cond_paths() {
     FUNINFO* f = currfuninfo;
     if (!f || !f->bb_list || opt_level() < 2 || size_speed_goal() < SPEED_MATTERS || pass_disable_cps) return;
     renumber_bblocks();
-    COND_PATHS paths(LEAST_GROWTH + nodes_of_function() / SHARE_OF_FUNCTION);
+    COND_PATHS paths(growth_by_copies());
     bool changed = false;
     for (int i = 0; i < MOST_PASSES && paths.run_once(); ++i) {
         changed = true;

@@ -3,8 +3,7 @@
 // A block that ends in a jump costs that in each execution unless its target follows. A test costs one branch if either
 // of its targets follows, and otherwise a jump on the colder edge. Blocks join to chains by what following saves,
 // dearest first, so that the chain of an inner loop exists before the blocks around it find their place, and ends in
-// the loop's test. (K. Pettis, R. C. Hansen, "Profile Guided Code Positioning", 1990, on estimated frequencies: a loop
-// iterates eight times.)
+// the loop's test. (K. Pettis, R. C. Hansen, "Profile Guided Code Positioning", 1990, on estimated frequencies.)
 //
 // Needs: block numbers and loops. Leaves: block numbers, which are layout positions.
 // Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does
@@ -15,9 +14,8 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
+#include "OPT5/ir/frequencies.h"
 #include "OPT5/ir/global.h"
-#include "OPT5/ir/loops.h"
-#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 
@@ -25,76 +23,6 @@
 #include <vector>
 
 namespace {
-
-constexpr double ITERATIONS = 8;
-
-// How often blocks and edges run, by the loops of the graph, for one run of the function.
-class ESTIMATES {
-public:
-    ESTIMATES() : loops(*currfuninfo->loops), of_block(size_t(currfuninfo->bb_count) + 1, 0.0) {
-        const std::vector<BBLK*> order = reverse_postorder();
-        std::vector<int> place(of_block.size(), 0);
-        for (size_t i = 0; i < order.size(); ++i) place[size_t(order[i]->dfn)] = int(i);
-        of_block[size_t(currfuninfo->bb_list->dfn)] = 1;
-        for (const BBLK* bb : order) {
-            double& frequency = of_block[size_t(bb->dfn)];
-            for (const EDGE* e = bb->predecessors; e; e = e->rest)
-                if (place[size_t(e->first->dfn)] < place[size_t(bb->dfn)]) frequency += of_edge(e->first, bb);
-            const NATURAL_LOOP* loop = loops.around(bb);
-            if (loop && loop->header == bb) frequency *= ITERATIONS;
-        }
-    }
-
-    double of_edge(const BBLK* from, const BBLK* to) const {
-        int likely = 0, unlikely = 0;
-        for (const EDGE* e = from->successors; e; e = e->rest) (is_in_deepest(from, e->first) ? likely : unlikely)++;
-        double share = 1.0 / (likely + unlikely);
-        if (likely && unlikely)
-            share = is_in_deepest(from, to) ? (1 - 1 / ITERATIONS) / likely : 1 / ITERATIONS / unlikely;
-        return of_block[size_t(from->dfn)] * share;
-    }
-    bool is_back_edge(const BBLK* from, const BBLK* to) const { return loops.dominates(to, from); }
-
-private:
-    // A test leads rather into a loop, and stays in it, than behind it.
-    bool is_in_deepest(const BBLK* from, const BBLK* to) const {
-        const int depth = depth_of(to);
-        for (const EDGE* e = from->successors; e; e = e->rest)
-            if (depth_of(e->first) > depth) return false;
-        return true;
-    }
-    int depth_of(const BBLK* bb) const {
-        int depth = 0;
-        for (const NATURAL_LOOP* loop = loops.around(bb); loop; loop = loop->parent) ++depth;
-        return depth;
-    }
-
-    static std::vector<BBLK*> reverse_postorder() {
-        std::vector<BBLK*> order;
-        std::vector<std::pair<BBLK*, const EDGE*>> path;
-        BLOCK_SET seen;
-        auto open = [&](BBLK* bb) {
-            if (seen.add(bb)) path.emplace_back(bb, bb->successors);
-        };
-        open(currfuninfo->bb_list);
-        while (!path.empty()) {
-            auto& [bb, rest] = path.back();
-            if (!rest) {
-                order.push_back(bb);
-                path.pop_back();
-                continue;
-            }
-            BBLK* next = rest->first;
-            rest = rest->rest;
-            open(next);
-        }
-        std::reverse(order.begin(), order.end());
-        return order;
-    }
-
-    const NATURAL_LOOPS& loops;
-    std::vector<double> of_block; // by number
-};
 
 // A block that could follow another.
 struct PAIR {
@@ -152,17 +80,34 @@ private:
         return follows_best->lbl->bblock != next;
     }
 
+    // What the dearest block in front of another would save, but for `from` and those that lead back.
+    struct CLAIMS {
+        const BBLK* from = nullptr;
+        double most = 0, next = 0;
+        void add(const BBLK* bb, double saves) {
+            next = std::max(next, std::min(most, saves));
+            if (saves > most) from = bb;
+            most = std::max(most, saves);
+        }
+        double without(const BBLK* bb) const { return bb == from ? next : most; }
+    };
+
     std::vector<PAIR> pairs() const {
+        std::vector<CLAIMS> claims(chains.size());
         std::vector<PAIR> all;
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
             for (const EDGE* e = bb->successors; e; e = e->rest) {
-                double others = 0;
-                for (const EDGE* other = e->first->predecessors; other; other = other->rest)
-                    if (other->first != bb && !frequencies.is_back_edge(other->first, e->first))
-                        others = std::max(others, cost_of_none(other->first, e->first));
-                all.push_back({bb, e->first, cost_of_none(bb, e->first), others, frequencies.is_back_edge(bb, e->first),
-                               negates(bb, e->first), frequencies.of_edge(bb, e->first)});
+                const PAIR pair{bb,
+                                e->first,
+                                cost_of_none(bb, e->first),
+                                0,
+                                frequencies.is_back_edge(bb, e->first),
+                                negates(bb, e->first),
+                                frequencies.of_edge(bb, e->first)};
+                if (!pair.is_back) claims[number(e->first)].add(bb, pair.saves);
+                all.push_back(pair);
             }
+        for (PAIR& pair : all) pair.spoils = claims[number(pair.second)].without(pair.first);
         std::stable_sort(all.begin(), all.end(), [](const PAIR& a, const PAIR& b) {
             if (a.saves != b.saves) return a.saves > b.saves;
             if (a.spoils != b.spoils) return a.spoils < b.spoils;
@@ -235,7 +180,7 @@ private:
         return found;
     }
 
-    const ESTIMATES frequencies;
+    const FREQUENCIES frequencies;
     std::vector<size_t> chain_of; // by number
     std::vector<std::vector<BBLK*>> chains;
 };

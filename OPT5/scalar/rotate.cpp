@@ -6,6 +6,7 @@
 // layout, so no block moves in between.
 
 #include "OPT5/scalar/simpcfg.h"
+#include "OPT5/scalar/tail_copies.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
@@ -246,10 +247,11 @@ void rotate_loops() {
         changed = true;
     }
     if (changed) renumber_bblocks();
-    constexpr int SIZE_MATTERS_MOST = 1;
+    constexpr int SIZE_MATTERS_MOST = 1, SPEED_MATTERS = 3;
     if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
         if (close_loops_by_tests()) rebuildcfg();
         skip_decided_entry_tests();
+        if (opt_level() >= 2 && size_speed_goal() >= SPEED_MATTERS && duplicate_tails()) renumber_bblocks();
         lay_out_blocks();
     }
 }

@@ -26,7 +26,8 @@ int live_index(const SYMTAB* sym);
 // successor of their block needs; with `keep_embedded` the last two are left out. Returns how many assignments were
 // removed. With `early` the graph is left to the caller to simplify.
 int elim_dead_assigns(bool keep_embedded, bool early);
-// In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads are removed.
+// In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads are removed. It
+// belongs to the forwarding of definitions by the analysis of loops, which is not built yet.
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop);
 // Whether a variable is an induction variable of the loop that has no use but to count; null while no loops are known.
 extern bool (*is_loop_counter)(const SYMTAB* sym, const struct LOOP* loop);

@@ -384,7 +384,9 @@ void MERGE::report(const GROUP& g, int n) {
     erase_tree(start);
 }
 
-// `by` is consumed: what stands for the address of the group, to which the use has an offset.
+// `by` is consumed: what stands for the address of the group, to which the use has an offset. Form 0 is through the group's
+// pointer, form 1 from a base that the counter moves. Form 2, through another group's pointer, has no work: uses at a
+// constant distance are in one group from the start, unless the distance fits no offset.
 void MERGE::replace(const GROUP& g, USE& use, NODE* by, int form) {
     NODE* old = *use.place;
     const int64_t skew = g.skew(use);

@@ -13,6 +13,7 @@ SYMTAB* clone_symbol(SYMTAB* sym, int n);
 // Computes the value of a variable that is set once and read once where it is read. The bits of the candidates stand.
 void eliminate_single_use_temps();
 
-// The pointers of the current function that a use of them has an offset to.
+// The pointers of the current function that a use of them has an offset to: their steps cannot all ride on accesses, which
+// the propagation of increments, not built yet, is to ask.
 void init_skewed_offset_syms();
 bool is_skewed_offset_sym(const SYMTAB* sym);

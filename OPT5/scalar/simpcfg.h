@@ -24,7 +24,8 @@ void simpcfg(bool quest_is_ok, bool keep_loops);
 // block, which takes over the successors. With `renumber` the depth-first numbers are valid afterwards.
 BBLK* split_block(BBLK* bb, LIST* cell, bool renumber);
 
-// Blocks that end the function in the same statements become one; the others jump there.
+// Blocks that end the function in the same statements become one; the others jump there. The simplifier ahead of the output
+// does it by itself; no row does it earlier: paths that share a tail no longer tell constants apart, nor bounds.
 void do_early_cross_jumping();
 
 void optimize_SWITCH_cases();

@@ -30,9 +30,51 @@ int in_turn(int n) {
     return sum;
 }
 
+// What follows both arms of a test is copied to the end of the one that would jump there, if it is small.
+// FUNCTION: arms
+// COUNT 2: n -= 1
+// COUNT 2: goto L1
+int arms(const int *p, int n) {
+    int a = 0, b = 0;
+    do {
+        if (*p > n) {
+            a += *p;
+            g[0] ^= a;
+        } else {
+            b -= *p;
+            g[1] += b;
+        }
+        p++;
+        n--;
+    } while (n > 0);
+    return a * 3 + b;
+}
+
+// FUNCTION: long_tail
+// COUNT 1: n -= 1
+int long_tail(const int *p, int n) {
+    int a = 0, b = 0;
+    do {
+        if (*p > n) {
+            a += *p;
+            g[0] ^= a;
+        } else {
+            b -= *p;
+            g[1] += b;
+        }
+        g[2] += p[n & 3] * a + b * 3 - g[0] * g[1];
+        g[3] ^= p[n & 1] * b + a * 5 - g[0] * g[2];
+        p++;
+        n--;
+    } while (n > 0);
+    return a * 3 + b;
+}
+
 int main(void) {
     put_i16(in_turn(4) + in_turn(0));
     for (int i = 0; i < 8; i++) g[i] = i * i;
     for (int n = -1; n < 7; n += 2) put_i16(nested(n));
+    static const int x[8] = {3, 9, -4, 2, 7, 7, -1, 5};
+    put_i16(arms(x, 5) + long_tail(x, 4));
     return 0;
 }

@@ -36,12 +36,8 @@ struct PAIR {
 
 class LAYOUT {
 public:
-    LAYOUT() : chain_of(size_t(currfuninfo->bb_count) + 1, 0) {
-        chains.resize(chain_of.size());
-        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-            chain_of[number(bb)] = number(bb);
-            chains[number(bb)] = {bb};
-        }
+    LAYOUT() : next(size()), previous(size()), other_end(size()) {
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) other_end[number(bb)] = bb;
     }
 
     void run() {
@@ -57,7 +53,8 @@ public:
     }
 
 private:
-    static size_t number(const BBLK* bb) { return size_t(bb->dfn); }
+    static size_t number(const BBLK* bb) { return static_cast<size_t>(bb->dfn); }
+    static size_t size() { return static_cast<size_t>(currfuninfo->bb_count) + 1; }
 
     // What it costs that no successor follows.
     double cost_of_none(const BBLK* bb, const BBLK* successor) const {
@@ -93,7 +90,7 @@ private:
     };
 
     std::vector<PAIR> pairs() const {
-        std::vector<CLAIMS> claims(chains.size());
+        std::vector<CLAIMS> claims(size());
         std::vector<PAIR> all;
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
             for (const EDGE* e = bb->successors; e; e = e->rest) {
@@ -119,26 +116,31 @@ private:
         return all;
     }
 
+    // The first must be the last of its chain, the second the first of another.
     void join(BBLK* first, BBLK* second) {
-        const size_t a = chain_of[number(first)], b = chain_of[number(second)];
-        if (a == b || second == currfuninfo->bb_list) return;
-        if (chains[a].back() != first || chains[b].front() != second) return;
-        for (BBLK* bb : chains[b]) {
-            chain_of[number(bb)] = a;
-            chains[a].push_back(bb);
-        }
-        chains[b].clear();
+        if (second == currfuninfo->bb_list || next[number(first)] || previous[number(second)]) return;
+        BBLK *head = other_end[number(first)], *tail = other_end[number(second)];
+        if (head == second) return;
+        next[number(first)] = second;
+        previous[number(second)] = first;
+        other_end[number(head)] = tail;
+        other_end[number(tail)] = head;
     }
 
     // The entry's chain comes first, the others in the order of what they are first left to from the ones before.
     void link() {
-        std::vector<BBLK*> order;
-        std::vector<char> placed(chains.size(), false);
+        std::vector<BBLK*> head_of(size()), order;
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            if (!previous[number(bb)])
+                for (BBLK* member = bb; member; member = next[number(member)]) head_of[number(member)] = bb;
         auto place = [&](const BBLK* bb) {
-            const size_t chain = chain_of[number(bb)];
-            if (placed[chain]) return;
-            placed[chain] = true;
-            order.insert(order.end(), chains[chain].begin(), chains[chain].end());
+            BBLK*& head = head_of[number(bb)];
+            if (!head) return;
+            for (BBLK* member = head; member;) {
+                order.push_back(member);
+                head_of[number(member)] = nullptr;
+                member = next[number(member)];
+            }
         };
         place(currfuninfo->bb_list);
         for (size_t i = 0; i < order.size(); ++i)
@@ -181,8 +183,8 @@ private:
     }
 
     const FREQUENCIES frequencies;
-    std::vector<size_t> chain_of; // by number
-    std::vector<std::vector<BBLK*>> chains;
+    // By number: the neighbours in the chain, and at both ends of one the other end.
+    std::vector<BBLK*> next, previous, other_end;
 };
 
 } // namespace

@@ -33,18 +33,6 @@ int impossible(unsigned x) {
     return g;
 }
 
-// FUNCTION: first_impossible
-// COUNT 0: case 20
-// HAS: /case 3: /
-int first_impossible(unsigned x) {
-    switch (x & 7) {
-    case 20: g = 77; break;
-    case 3: g = 10; break;
-    default: g = 5;
-    }
-    return g;
-}
-
 // FUNCTION: stride
 // COUNT 0: case 5
 // HAS: /switch .*case 1: .*case 2: /
@@ -97,31 +85,16 @@ int without(int x) {
     return 7;
 }
 
-// FUNCTION: own
-// HAS: /switch .*default: L\d+;/
-int own(int x) {
-    int r = 0;
-    switch (x) {
-    case 3: r = 1; break;
-    case 30: r = 2; break;
-    case -300: r = 3; break;
-    default: r = 4;
-    }
-    return r;
-}
-
 int main(void) {
     for (int i = -2; i < 9; i++) {
         put_i16(full((unsigned)i));
         put_i16(impossible((unsigned)i));
         put_i16(stride((unsigned)i));
-        put_i16(first_impossible((unsigned)i));
         put_i16(open(i));
         put_i16(sparse((unsigned)i));
     }
     put_i16(sparse(31) + sparse(60));
     int i;
     for (i = 0; i < 4; i++) put_i16(without(i));
-    put_i16(own(3) + 10 * own(30) + 100 * own(-300) + 1000 * own(0));
     return 0;
 }

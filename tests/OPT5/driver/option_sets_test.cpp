@@ -88,14 +88,10 @@ TEST_F(Flags, CommandLineWinsInEverySet) {
     };
     const ROW rows[] = {
         {"--opt_level=1", "-o3", "--opt_level=3"},
-        {"--endian=little", "-e", "--big_endian"},
         {"-e", "--endian=little", "--endian=little"},
-        {"-h0", "-h1", "--std_lib_func_defined"},
         {"-a", "-t", "--no_bad_aliases"},
         {"-i5", "--disable_inlining", "--disable_inlining"},
-        {"--use_g2", "--use_g3", "--use_g3"},
         {"-v27", "-v28", "--silicon_version=28"},
-        {"--mem_model:data=near", "--mem_model:data=flat", "--mem_model:data=flat"},
         {"-x1", "-x2", "--aux_cmd_flag=1 --aux_cmd_flag=2"},
     };
     for (const ROW& row : rows) {

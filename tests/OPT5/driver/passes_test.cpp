@@ -111,4 +111,11 @@ TEST(Steps, RandomOrdersArePermutations) {
     }
 }
 
+TEST(Steps, MachineDescriptionCheckWritesNothing) {
+    WORKPLACE w;
+    w.put("a.if", unit());
+    EXPECT_EQ(w.run({"--debug:parser", "a.if", "b.if"}).status, 0);
+    EXPECT_FALSE(w.has("b.if"));
+}
+
 } // namespace

@@ -13,6 +13,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/exact.h"
@@ -128,7 +129,7 @@ INT65 residue(INT65 v, INT65 modulus) {
 }
 
 bool may_differ_in_loop(const NODE* tree, struct LOOP* loop) {
-    return loop && !(loop_assertion_hooks.tree_is_RC_in_loop && loop_assertion_hooks.tree_is_RC_in_loop(tree, loop));
+    return loop && !(loop_callbacks.is_constant_in && loop_callbacks.is_constant_in(tree, loop));
 }
 
 } // namespace

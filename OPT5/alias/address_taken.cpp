@@ -205,7 +205,7 @@ void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased) {
                 mark(sym);
             else
                 sym->set_is_aliased(false);
-            if (clear_bitnum) sym->set_bitnum(-1);
+            if (clear_bitnum) sym->set_bitnum(NOT_A_CANDIDATE);
         });
     });
 }

@@ -6,14 +6,13 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/target/bif.h"
 
 #include <cstring>
 
-LOOP_ASSERTION_HOOKS loop_assertion_hooks;
-bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b) = nullptr;
 
 void init_dd_aliasing() { need(fact::alias); }
 void propagate_PT_info() {}
@@ -168,8 +167,6 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     if (object_b && is_out_of_reach(object_b, a, x)) return false;
     if (accesses_are_disjoint(x, y, loop)) return false;
     if (are_kept_apart(a, b, loop != nullptr) || are_told_apart_by_records(a, b)) return false;
-    if (UMULT_PT_targets_may_overlap && a->rare().ptenv && b->rare().ptenv && !UMULT_PT_targets_may_overlap(a, b))
-        return false;
     const NODE *p = pointer_of(a), *q = pointer_of(b);
     if (loop && p && q && pointers_are_antialiased(p, q, loop, loop)) return false;
     if (by_type) {
@@ -195,29 +192,26 @@ const NODE* bare_pointer(const NODE* p) {
 
 int depth_of(struct LOOP* loop) {
     int depth = 0;
-    for (; loop; loop = loop_assertion_hooks.parent(loop)) ++depth;
+    for (; loop; loop = loop_callbacks.parent(loop)) ++depth;
     return depth;
 }
 
 struct LOOP* innermost_common_loop(struct LOOP* a, struct LOOP* b) {
     int da = depth_of(a), db = depth_of(b);
-    for (; da > db; --da) a = loop_assertion_hooks.parent(a);
-    for (; db > da; --db) b = loop_assertion_hooks.parent(b);
-    for (; a != b; b = loop_assertion_hooks.parent(b)) a = loop_assertion_hooks.parent(a);
+    for (; da > db; --da) a = loop_callbacks.parent(a);
+    for (; db > da; --db) b = loop_callbacks.parent(b);
+    for (; a != b; b = loop_callbacks.parent(b)) a = loop_callbacks.parent(a);
     return a;
 }
 
 } // namespace
 
 bool pointers_are_antialiased(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q) {
-    const LOOP_ASSERTION_HOOKS& hooks = loop_assertion_hooks;
-    if (!loop_p || !loop_q || !hooks.parent || !hooks.assertions) return false;
+    if (!loop_p || !loop_q || !loop_callbacks.parent || !loop_callbacks.givens) return false;
     p = bare_pointer(p);
     q = bare_pointer(q);
-    for (struct LOOP* loop = innermost_common_loop(loop_p, loop_q); loop; loop = hooks.parent(loop)) {
-        const std::vector<NODE*>* assertions = hooks.assertions(loop);
-        if (!assertions) continue;
-        for (const NODE* fact : *assertions) {
+    for (struct LOOP* loop = innermost_common_loop(loop_p, loop_q); loop; loop = loop_callbacks.parent(loop)) {
+        for (const NODE* fact : loop_callbacks.givens(loop)) {
             if (!is_ANTIALIASED_ICALL(fact)) continue;
             const NODE *x = arg_list_lookup(fact->left, 0), *y = arg_list_lookup(fact->left, 1);
             if (!x || !y) continue;
@@ -231,16 +225,16 @@ bool pointers_are_antialiased(const NODE* p, const NODE* q, struct LOOP* loop_p,
 }
 
 void add_antialiasing_loop_assertion(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q) {
-    const LOOP_ASSERTION_HOOKS& hooks = loop_assertion_hooks;
-    if (!loop_p || !loop_q || !hooks.parent || !hooks.add || pointers_are_antialiased(p, q, loop_p, loop_q)) return;
+    if (!loop_p || !loop_q || !loop_callbacks.parent || !loop_callbacks.add_given) return;
+    if (pointers_are_antialiased(p, q, loop_p, loop_q)) return;
     struct LOOP* loop = innermost_common_loop(loop_p, loop_q);
     if (!loop) return;
-    hooks.add(loop, make_ANTIALIASED_ICALL(copy_tree(bare_pointer(p)), copy_tree(bare_pointer(q))));
+    loop_callbacks.add_given(loop, make_ANTIALIASED_ICALL(copy_tree(bare_pointer(p)), copy_tree(bare_pointer(q))));
 }
 
 bool build_the_umults_alias_free_by_predication_lists(const NODE* a, const NODE* b, struct LOOP* loop) {
-    if (!loop_assertion_hooks.predicate_disjointness) return false;
-    const bool added = loop_assertion_hooks.predicate_disjointness(a, b, loop);
+    if (!loop_callbacks.predicate_disjointness) return false;
+    const bool added = loop_callbacks.predicate_disjointness(a, b, loop);
     if (print_debug) {
         debug_printf(added ? "Adding an alias assertion that %s and" : "Failing to add alias assertion that %s and",
                      tree_to_infix(a).c_str());

@@ -50,20 +50,8 @@ bool object_symbols_may_alias(const SYMTAB* a, const SYMTAB* b);
 bool unaliased_by_scope(const NODE* a, const NODE* b); // by `restrict`
 // Whether an assertion of a loop around both says that what `p` and `q` point to is disjoint.
 bool pointers_are_antialiased(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q);
-// What lists the assertions of a loop and its parent; null while no loops are known.
-struct LOOP_ASSERTION_HOOKS {
-    const std::vector<NODE*>* (*assertions)(struct LOOP* loop) = nullptr;
-    struct LOOP* (*parent)(struct LOOP* loop) = nullptr;
-    void (*add)(struct LOOP* loop, NODE* assertion) = nullptr; // takes the tree
-    bool (*tree_is_RC_in_loop)(const NODE* tree, struct LOOP* loop) = nullptr;
-    // Makes the loop run as assumed only where the two turn out disjoint before it; false: that cannot be asked.
-    bool (*predicate_disjointness)(const NODE* a, const NODE* b, struct LOOP* loop) = nullptr;
-};
-extern LOOP_ASSERTION_HOOKS loop_assertion_hooks;
 // Whether two accesses of a loop are disjoint from now on, since a test ahead of the loop makes sure of it.
 bool build_the_umults_alias_free_by_predication_lists(const NODE* a, const NODE* b, struct LOOP* loop);
-// Whether the points-to environments of two accesses leave them a common place; null while there are none.
-extern bool (*UMULT_PT_targets_may_overlap)(const NODE* a, const NODE* b);
 void add_antialiasing_loop_assertion(const NODE* p, const NODE* q, struct LOOP* loop_p, struct LOOP* loop_q);
 
 // ---- Shapes

@@ -15,6 +15,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <unordered_set>
 
 std::vector<REGISTER_ASSIGNMENT> register_assignments;
 
@@ -196,19 +197,16 @@ SYMTAB* addressed_object(const NODE* t) {
     return object ? object->u.sym : nullptr;
 }
 
-// One walk over what will be written: which locals it names and which have their address taken, and whether it calls.
-// The count of uses stops at 1, since the word is narrow and only zero matters.
-void survey(FUNINFO* f) {
+// One walk over what will be written: which locals it names, which have their address taken, and whether it calls.
+std::unordered_set<const SYMTAB*> survey(FUNINFO* f) {
     for (SYMTAB* list : {f->scalar_syms, f->memory_syms, f->new_syms, f->pending_syms})
         for (SYMTAB* s = list; s; s = s->next)
-            if (s->level == 2) {
-                s->set_bitnum(0);
-                s->set_is_aliased(false);
-            }
+            if (s->level == 2) s->set_is_aliased(false);
     calls_are_written = false;
-    auto visit = [](NODE* t) {
+    std::unordered_set<const SYMTAB*> named; // membership only
+    auto visit = [&](NODE* t) {
         if (t->op == NAME && t->u.sym->level == 2)
-            t->u.sym->set_bitnum(1);
+            named.insert(t->u.sym);
         else if (op_is_call(t->op))
             calls_are_written = true;
         else if (SYMTAB* object = addressed_object(t); object && object->level == 2)
@@ -216,17 +214,18 @@ void survey(FUNINFO* f) {
     };
     for_each_tree(f, [&](NODE* tree) { for_each_node(tree, visit); });
     for (EHT_ITEM& item : f->eht) for_each_node(item.cleanup, visit);
+    return named;
 }
 
 } // namespace
 
 void drop_unused_locals() {
     FUNINFO* f = currfuninfo;
-    survey(f);
+    const std::unordered_set<const SYMTAB*> named = survey(f);
     for (SYMTAB** list : {&f->scalar_syms, &f->memory_syms, &f->new_syms, &f->pending_syms})
         for (SYMTAB** link = list; *link;) {
             SYMTAB* s = *link;
-            if (s->level != 2 || s->bitnum() != 0) {
+            if (s->level != 2 || named.count(s)) {
                 link = &s->next;
                 continue;
             }

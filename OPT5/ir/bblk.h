@@ -89,9 +89,6 @@ void change_successors(BBLK* bb, const std::vector<SUCCESSOR_CHANGE>& changes); 
 BBLK* split_cfg_edge(BBLK* a, BBLK* b, bool renumber = true);
 void split_critical_edges(bool all);
 bool bb_is_split_critical_edge(const BBLK* bb);
-// Answers and upkeep of the loop analysis for edge splitting; null while it does not run.
-extern bool (*edge_is_loop_back_edge)(const BBLK* from, const BBLK* to);
-extern void (*loop_edge_was_split)(BBLK* from, BBLK* middle, BBLK* to);
 void subst_bb_for_bb_in_bb(BBLK* to, BBLK* from, BBLK* in);
 void subst_bb_for_bb_in_stmts(BBLK* to, BBLK* from, LIST* list);
 void remap_labelrefs(NODE* tree, LBL* from, LBL* to);

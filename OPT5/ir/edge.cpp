@@ -5,6 +5,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/side_table.h"
 #include "OPT5/ir/trees.h"
 
@@ -189,9 +190,6 @@ void subst_bb_for_bb_in_bb(BBLK* to, BBLK* from, BBLK* in) { subst_bb_for_bb_in_
 
 // ---- Splitting
 
-bool (*edge_is_loop_back_edge)(const BBLK* from, const BBLK* to) = nullptr;
-void (*loop_edge_was_split)(BBLK* from, BBLK* middle, BBLK* to) = nullptr;
-
 namespace {
 
 // Makes block n between `a` and `b`; the depth-first numbers are stale afterwards.
@@ -215,7 +213,7 @@ BBLK* make_block_on_edge(BBLK* a, BBLK* b) {
 // of a loop.
 bool edge_may_stay(const BBLK* a, const BBLK* b) {
     if (!a->loop) return a->dfn < b->dfn;
-    return a->loop == b->loop && edge_is_loop_back_edge && edge_is_loop_back_edge(a, b);
+    return a->loop == b->loop && loop_callbacks.is_back_edge && loop_callbacks.is_back_edge(a, b);
 }
 
 } // namespace
@@ -238,7 +236,7 @@ void split_critical_edges(bool all) {
             if (!b->predecessors || !b->predecessors->rest || (!all && edge_may_stay(a, b))) continue;
             debug_printf("Splitting critical edge between BB%d and BB%d\n", a->dfn, b->dfn);
             BBLK* n = make_block_on_edge(a, b);
-            if (a->loop && b->loop && loop_edge_was_split) loop_edge_was_split(a, n, b);
+            if (a->loop && b->loop && loop_callbacks.edge_was_split) loop_callbacks.edge_was_split(a, n, b);
             e = a->successors; // the list has changed
             changed = true;
         }

@@ -4,11 +4,14 @@
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
+
+LOOP_CALLBACKS loop_callbacks;
 
 size_t NATURAL_LOOPS::slot(const BBLK* bb) const { return static_cast<size_t>(bb->dfn); }
 

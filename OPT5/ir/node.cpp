@@ -32,10 +32,7 @@ NODE* clone_node(const NODE* t) {
     NODE* c = new NODE(*t);
     if (!t->rare_m) return c;
     c->rare_m = new RARE_FIELDS(*t->rare_m);
-    c->rare_m->scratch = nullptr;
     c->rare_m->dd = nullptr;
-    c->rare_m->ptenv = nullptr;
-    c->rare_m->scratch_word = 0;
     return c;
 }
 

@@ -18,7 +18,6 @@
 class NODE;
 class SYMTAB;
 class SSAVAR;
-class PTENV;
 struct LIST;
 struct LS;
 class BBLK;
@@ -44,15 +43,10 @@ struct DDNODE_RECORD {
 
 // What few nodes need: those with a profile, and those that an analysis of loops or of SSA form is at work on.
 struct RARE_FIELDS {
-    int64_t depnum = 0;
     double weight = -1.0;     // LABELREF profile weight, -1.0 for none
     intptr_t branch_hint = 0; // LABELREF: below zero unlikely, above zero likely
     NODE* ssa_args = nullptr; // SSA_PHI
-    // Of a node, not of its copies.
-    void* scratch = nullptr; // of the SSA and value propagation passes
-    DDNODE_RECORD* dd = nullptr;
-    PTENV* ptenv = nullptr;
-    uint32_t scratch_word = 0;
+    DDNODE_RECORD* dd = nullptr; // of the node, not of its copies
 };
 
 class NODE final : public BASE_NODE {
@@ -89,9 +83,6 @@ public:
 
     const RARE_FIELDS& rare() const { return rare_m ? *rare_m : no_rare_fields; }
     RARE_FIELDS& make_rare();
-    void clear_scratch() {
-        if (rare_m) rare_m->scratch = nullptr;
-    }
 
     uint32_t eh_entry() const { return op_is_call(op) ? number : 0; } // exception table entry, 0 for none
     void set_eh_entry(uint32_t entry) {

@@ -65,6 +65,8 @@ struct SYM_RANGE {
     uint32_t flags1, flags2;
 };
 
+constexpr uint16_t NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
+
 class SYMTAB : public I_SYMTAB {
 public:
     // `index` and `retention` come from I_SYMTAB.
@@ -89,7 +91,7 @@ public:
     uint32_t option_set = 0;
     SYMTAB* next = nullptr; // link of whichever symbol list holds it
     int64_t depnum_m = 0; // of a function's symbol: its place in the order of reading, from 0
-    uint16_t bitnum_m = 0;
+    uint16_t bitnum_m = NOT_A_CANDIDATE; // the bit of a candidate while `fact::live_variables` is known
     bool is_aliased_m = false;
     bool is_temp = false;
     bool dynamic_init = false;         // initialized at run time

@@ -12,7 +12,6 @@
 #include <cstdlib>
 #include <cstring>
 
-PTENV_HOOKS ptenv_hooks;
 
 // ---- Copying
 static void own_payload(NODE* c) {
@@ -57,7 +56,6 @@ NODE* copy_node(const NODE* t, bool keep_scope) {
 NODE* copy_dd_node(const NODE* t, bool keep_scope) {
     NODE* c = bare_copy(t, keep_scope);
     const RARE_FIELDS& rare = t->rare();
-    if (rare.ptenv && ptenv_hooks.copy) c->make_rare().ptenv = ptenv_hooks.copy(rare.ptenv);
     if (rare.dd && (t->op == DDNODE || t->op == UMULT))
         c->make_rare().dd = new DDNODE_RECORD{nullptr, c, copy_tree(rare.dd->copy), rare.dd->id};
     return c;
@@ -148,7 +146,6 @@ static void drop_payload(NODE* t) {
     case PPRAGMA: delete t->pragma; break;
     }
     const RARE_FIELDS& rare = t->rare();
-    if (rare.ptenv && ptenv_hooks.erase) ptenv_hooks.erase(rare.ptenv);
     if (rare.dd && rare.dd->node == t) {
         erase_tree(rare.dd->copy);
         delete rare.dd;

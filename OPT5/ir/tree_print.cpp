@@ -367,7 +367,6 @@ void dump_payload(FILE* out, const NODE* t) {
     }
     if (t->edge_profile() != NO_PROFILE) fprintf(out, " profile=%u", t->edge_profile());
     if (t->rare().weight >= 0.0) fprintf(out, " weight=%g", t->rare().weight);
-    if (t->rare().depnum) fprintf(out, " depnum=%lld", static_cast<long long>(t->rare().depnum));
     if (t->eh_entry()) fprintf(out, " eh=%u", t->eh_entry());
 }
 

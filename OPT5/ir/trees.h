@@ -119,13 +119,6 @@ LIST* copy_statements(const LIST* list, bool keep_scope = true);
 LIST* copy_shared_statements(const LIST* list);
 LIST* copy_dd_statements(const LIST* list, bool keep_scope = true);
 
-// What copying and erasing do to a node's points-to environment; null while nothing makes any.
-struct PTENV_HOOKS {
-    PTENV* (*copy)(const PTENV*) = nullptr;
-    void (*erase)(PTENV*) = nullptr;
-};
-extern PTENV_HOOKS ptenv_hooks;
-
 // ---- Erasing. A node erased twice is an internal error. LABELREFs are not discounted: their labels may be freed by
 // then.
 void erase_tree(NODE* t);

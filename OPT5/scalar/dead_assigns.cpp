@@ -18,6 +18,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -289,8 +290,6 @@ int elim_dead_assigns(bool keep_embedded, bool early) {
 
 // ---- Counters
 
-bool (*is_loop_counter)(const SYMTAB* sym, const struct LOOP* loop) = nullptr;
-
 namespace {
 
 class COUNTER_STEPS final : public BACKWARD_WALK {
@@ -299,7 +298,7 @@ public:
         for (LIST* s = bb->statements; s; s = s->rest)
             for_each_node(s->first, [&](const NODE* t) {
                 const int bit = t->op == NAME ? live_index(t->u.sym) : -1;
-                if (bit >= 0 && is_loop_counter(t->u.sym, loop)) is_counter.set(static_cast<uint32_t>(bit));
+                if (bit >= 0 && loop_callbacks.is_counter(t->u.sym, loop)) is_counter.set(static_cast<uint32_t>(bit));
             });
     }
 
@@ -318,7 +317,7 @@ private:
 } // namespace
 
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop) {
-    if (!loop || !is_loop_counter || !live_at_exit(bb)) return;
+    if (!loop || !loop_callbacks.is_counter || !live_at_exit(bb)) return;
     COUNTER_STEPS(bb, loop).block(bb);
     drop_empty_cells(&bb->statements);
 }

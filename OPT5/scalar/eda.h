@@ -12,8 +12,6 @@ class SYMTAB;
 struct LIST;
 
 // ---- Live variables
-constexpr int NOT_A_CANDIDATE = 65535; // `bitnum` of a symbol that has no bit
-
 // Gives every local scalar that only its own NAME can reach a bit, `bitnum`, and finds the sets of all blocks: what
 // `need(fact::live_variables)` does where they are not known.
 void find_live_variables();
@@ -29,8 +27,6 @@ int elim_dead_assigns(bool keep_embedded, bool early);
 // In the latch of `loop`, where the live sets exist: assignments to its counters whose value no one reads are removed. It
 // belongs to the forwarding of definitions by the analysis of loops, which is not built yet.
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop);
-// Whether a variable is an induction variable of the loop that has no use but to count; null while no loops are known.
-extern bool (*is_loop_counter)(const SYMTAB* sym, const struct LOOP* loop);
 // `x = e; y = x;` with `x` not read again becomes `y = e` in the first cell.
 bool combine_assignments(LIST* cell);
 // A destructor need not store to members that no later statement reads.

@@ -370,7 +370,6 @@ SYMTAB* MERGE::make_pointer(TYPE* type, const LINEAR_ADDRESS& from, NODE* start)
 SYMTAB* MERGE::make_temporary(NODE* value) {
     TYPE* type = value->type->stqs();
     SYMTAB* sym = sym_temp('P', -1, type, nullptr);
-    sym->set_bitnum(NOT_A_CANDIDATE);
     insert_at_end_of_body(ahead, maketree(ASG, mk_NAME(sym), value, type));
     return sym;
 }

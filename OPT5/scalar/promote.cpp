@@ -245,7 +245,6 @@ private:
 
     NODE* saved_value(NODE* t) {
         SYMTAB* temp = sym_temp('T', -1, t->left->type, nullptr);
-        temp->set_bitnum(NOT_A_CANDIDATE);
         before.push_back(mk_ASG(mk_NAME(temp), copy_tree(t->left)));
         before.push_back(step(t));
         erase_tree(t);

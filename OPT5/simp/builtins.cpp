@@ -183,13 +183,13 @@ NODE* simp_ALIGNED_ICALL(NODE* t, struct LOOP* loop) {
     (void)loop;
 }
 
-struct HOOK {
+struct CALLBACKS {
     const char* name;
     BIF::SIMPLIFIER simplify;
     BIF::EVALUATOR evaluate;
 };
 
-const HOOK hooks[] = {
+const CALLBACKS callbacks[] = {
     {"quest$colon", simp_strict_ternary_ICALL, eval_qc_ICALL},
     {"DONOTCSE", simp_DONOTCSE_ICALL, nullptr},
     {"__builtin_expect", simp_builtin_expect_ICALL, nullptr},
@@ -208,13 +208,13 @@ constexpr const char* accesses[] = {"MEM2", "MEM4", "MEM8", "MEMD8"};
 
 void install_BIF_simplifiers() {
     if (!find_BIF_descriptor("quest$colon")) return; // a start without descriptors
-    for (const HOOK& h : hooks) set_BIF_hooks(h.name, h.simplify, h.evaluate);
-    for (const char* name : extrema) set_BIF_hooks(name, simp_minmax_ICALL, nullptr);
-    for (const char* name : absolutes) set_BIF_hooks(name, simp_absolute_ICALL, nullptr);
+    for (const CALLBACKS& c : callbacks) set_BIF_callbacks(c.name, c.simplify, c.evaluate);
+    for (const char* name : extrema) set_BIF_callbacks(name, simp_minmax_ICALL, nullptr);
+    for (const char* name : absolutes) set_BIF_callbacks(name, simp_absolute_ICALL, nullptr);
     for (const char* access : accesses)
         for (const char* suffix : {"", "_CONST"}) {
-            set_BIF_hooks((std::string("SORREL_") + access + suffix).c_str(), simp_NONALIGN_ICALL, nullptr);
-            set_BIF_hooks((std::string("SORREL_A") + access + suffix).c_str(), simp_ALIGNED_ICALL, nullptr);
+            set_BIF_callbacks((std::string("SORREL_") + access + suffix).c_str(), simp_NONALIGN_ICALL, nullptr);
+            set_BIF_callbacks((std::string("SORREL_A") + access + suffix).c_str(), simp_ALIGNED_ICALL, nullptr);
         }
 }
 

@@ -301,7 +301,6 @@ NODE* dispatch(NODE* t, struct LOOP* loop) {
 NODE* simp_node(NODE* t, struct LOOP* loop) {
     if (has_no_meaning(t->op)) bad_opcode(t);
     t->type = normalized_value_type(t->type);
-    if (t->op != UMULT) t->clear_scratch();
     if (!keeps_operands_in_place(t->op))
         if (NODE* hoisted = hoist_effects(t, loop)) return hoisted;
     if (has_constant_operands(t)) {

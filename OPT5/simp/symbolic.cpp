@@ -11,8 +11,6 @@
 
 #include <numeric>
 
-LOOP_CALLBACKS loop_callbacks;
-
 namespace {
 
 constexpr int MOST_LEVELS = 3; // of operators that are looked through for a value other than zero

@@ -12,6 +12,7 @@
 // node of a tree stays linear.
 #pragma once
 
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/node.h"
 
 #include <cstdint>
@@ -87,10 +88,3 @@ int compare_SLLONG_values(INT65 a, INT65 b, TYPE* type); // -1, 0, 1: both as `t
 
 void install_symbolic_callbacks(); // once: other rooms' questions are answered here
 
-// What the questions ask of a loop, installed by the room that keeps loops; with null, a loop tells nothing.
-struct LOOP_CALLBACKS {
-    const std::vector<NODE*>& (*givens)(const struct LOOP* loop) = nullptr; // conditions that hold throughout the loop
-    struct LOOP* (*parent)(const struct LOOP* loop) = nullptr;              // null of the outermost
-    bool (*is_constant_in)(const NODE* tree, const struct LOOP* loop) = nullptr; // one value in all iterations
-};
-extern LOOP_CALLBACKS loop_callbacks;

@@ -269,9 +269,9 @@ BIF* instantiate_associative_BIF(const char* name, BIF* bif) {
     return other;
 }
 
-void set_BIF_hooks(const char* name, BIF::SIMPLIFIER simplifier, BIF::EVALUATOR evaluator) {
+void set_BIF_callbacks(const char* name, BIF::SIMPLIFIER simplifier, BIF::EVALUATOR evaluator) {
     BIF* bif = find_BIF_descriptor(name);
-    if (!bif) internal_error("\n\n!!! INTERNAL ERROR in set_BIF_hooks()\n");
+    if (!bif) internal_error("\n\n!!! INTERNAL ERROR in set_BIF_callbacks()\n");
     for (auto& entry : descriptors) {
         BIF* b = entry.second.get();
         if (b != bif && !(bif->has(IS_GENERIC) && b->partner == bif)) continue;

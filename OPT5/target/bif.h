@@ -74,7 +74,7 @@ NODE* get_BIF_parameter(char letter, BIF* bif);
 void add_BIF_semantics(BIF* bif, NODE* tree, bool must_expand);
 BIF* instantiate_generic_BIF(const char* name, BIF* generic);
 BIF* instantiate_associative_BIF(const char* name, BIF* bif);
-void set_BIF_hooks(const char* name, BIF::SIMPLIFIER simplifier, BIF::EVALUATOR evaluator); // the instances' too
+void set_BIF_callbacks(const char* name, BIF::SIMPLIFIER simplifier, BIF::EVALUATOR evaluator); // the instances' too
 
 // ---- Finding. Null for an unknown name.
 BIF* find_BIF_descriptor(const char* name);

@@ -172,7 +172,7 @@ void allocate_regs() {
     wrapup_allocation();
 }
 
-// ---- Hooks
+// ---- What a register allocator asks of the target
 void find_target_conflicts(NODE*, BITVEC*, BITVEC*, long) {}
 void mark_live_across_call(BITVEC*, NODE*) {}
 void target_lra_uses(NODE*, BITVEC*) {}

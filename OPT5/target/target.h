@@ -46,7 +46,7 @@ struct UNROLLING_CALLBACKS {
 };
 extern UNROLLING_CALLBACKS unrolling_callbacks;
 
-// ---- Hooks of a register allocator; nothing to do here
+// ---- What a register allocator asks of the target; nothing to do here
 void find_target_conflicts(NODE* t, BITVEC* live, BITVEC* conflicts, long index);
 void mark_live_across_call(BITVEC* live, NODE* call);
 void target_lra_uses(NODE* t, BITVEC* uses);

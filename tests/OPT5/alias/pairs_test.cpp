@@ -2,6 +2,8 @@
 
 #include "alias_fixture.h"
 
+#include "OPT5/ir/loop_callbacks.h"
+
 namespace {
 
 using Pairs = AliasTest;
@@ -132,9 +134,9 @@ TEST_F(Pairs, OffsetsFromOnePointer) {
     NODE *first = keep(deref(name(p))), *second = keep(deref(sum(name(p), icon(1))));
     auto* loop = reinterpret_cast<struct LOOP*>(&first);
     EXPECT_TRUE(lvalues_may_be_aliased(first, second, loop));
-    loop_assertion_hooks.tree_is_RC_in_loop = [](const NODE*, struct LOOP*) { return true; };
+    loop_callbacks.is_constant_in = [](const NODE*, const struct LOOP*) { return true; };
     EXPECT_FALSE(lvalues_may_be_aliased(first, second, loop));
-    loop_assertion_hooks = {};
+    loop_callbacks = {};
 }
 
 TEST_F(Pairs, AbsoluteAddresses) {

@@ -3,6 +3,7 @@
 #include "../ir/function_fixture.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
 #include "OPT5/simp/simp.h"
@@ -138,11 +139,11 @@ TEST_F(FcpTest, CountersLoseTheStepsThatNoOneReads) {
     ret(n);
     build();
     auto* loop = reinterpret_cast<struct LOOP*>(i);
-    is_loop_counter = [](const SYMTAB* sym, const struct LOOP* l) { return reinterpret_cast<const SYMTAB*>(l) == sym; };
+    loop_callbacks.is_counter = [](const SYMTAB* sym, const struct LOOP* l) { return reinterpret_cast<const SYMTAB*>(l) == sym; };
     find_live_variables();
     elim_locally_dead_assignments_in_bb(currfuninfo->bb_list, loop);
     lva_cleanup();
-    is_loop_counter = nullptr;
+    loop_callbacks = {};
     EXPECT_TRUE(says("i += 1") && says("k += 3")) << statements();
     EXPECT_FALSE(says("i += 2")) << statements();
     EXPECT_TRUE(valid());

@@ -201,10 +201,7 @@ BBLK* make_block_on_edge(BBLK* a, BBLK* b) {
     a->successors = add_edge(n, a->successors);
     n->predecessors = mkedge(a, nullptr);
     subst_bb_for_bb_in_bb(n, b, a);
-    if (live_at_entry(b)) {
-        const BITVEC live = *live_at_entry(b);
-        a->owner()->live_sets->of[n] = {live, live};
-    }
+    copy_live_at_entry(b, n);
     edges_were_changed(a->owner());
     return n;
 }

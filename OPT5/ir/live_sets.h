@@ -1,22 +1,27 @@
-// Which candidates are live at both ends of a block, by `bitnum`: what `fact::live_variables` holds beside the numbers.
+// Which candidates are live at the entry of a block, by `bitnum`: what `fact::live_variables` holds beside the numbers.
+//
+// Few of a function's candidates are live in any one place, so they are listed: bit vectors for all blocks would take the
+// square of the function's size.
 #pragma once
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/ir/side_table.h"
 
+#include <cstdint>
+#include <vector>
+
 struct LIVE_SETS {
-    struct ENDS {
-        BITVEC entry, exit; // of `FUNINFO::lva_sym_count` bits; of none where a block was made since
+    struct ENTRY {
+        bool is_known = false;      // not of a block that was made since
+        std::vector<uint16_t> live; // ascending
     };
-    SIDE_TABLE<ENDS> of;
+    SIDE_TABLE<ENTRY> at_entry;
 };
 
-// Null where the block has no set. Valid until the next block gets one.
-inline BITVEC* live_at_entry(const BBLK* bb) {
-    LIVE_SETS* sets = bb->owner()->live_sets.get();
-    return sets && sets->of[bb].entry.bits ? &sets->of[bb].entry : nullptr;
-}
-inline BITVEC* live_at_exit(const BBLK* bb) {
-    LIVE_SETS* sets = bb->owner()->live_sets.get();
-    return sets && sets->of[bb].exit.bits ? &sets->of[bb].exit : nullptr;
-}
+bool live_at_entry_is_known(const BBLK* bb);
+bool is_live_at_entry(const BBLK* bb, int bit);
+void set_live_at_entry(const BBLK* bb, int bit, bool is_live); // of a block whose set is known
+// What is live at the block's end: all candidates, if that of a successor is not known.
+void add_live_at_exit(const BBLK* bb, BITVEC& live);
+// For a new block whose only successor is `bb`.
+void copy_live_at_entry(const BBLK* bb, const BBLK* made);

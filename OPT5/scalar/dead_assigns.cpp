@@ -130,12 +130,10 @@ class ELIMINATION final : public BACKWARD_WALK {
 public:
     int count = 0;
 
-    ELIMINATION() : faint(FAINT_VARIABLES().find()) {}
+    ELIMINATION() : live(static_cast<uint32_t>(currfuninfo->lva_sym_count)), faint(FAINT_VARIABLES().find()) {}
 
     void run(BBLK* bb) {
         start_from_successors(bb);
-        live -= faint;
-        *live_at_exit(bb) = live;
         std::vector<LIST*> cells;
         for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
         COPY copy, copy_behind; // of the next statement and of the one behind it
@@ -167,13 +165,9 @@ public:
 
 private:
     void start_from_successors(const BBLK* bb) {
-        live = BITVEC(static_cast<uint32_t>(currfuninfo->lva_sym_count));
-        for (const EDGE* e = bb->successors; e; e = e->rest) {
-            if (const BITVEC* set = live_at_entry(e->first))
-                live |= *set;
-            else
-                live.set_all();
-        }
+        live.clear_all();
+        add_live_at_exit(bb, live);
+        live -= faint;
     }
 
     // The variables are read and written by the call; the one that held the value is not live in front of it.
@@ -294,7 +288,9 @@ namespace {
 
 class COUNTER_STEPS final : public BACKWARD_WALK {
 public:
-    COUNTER_STEPS(BBLK* bb, const struct LOOP* loop) : live(*live_at_exit(bb)), is_counter(live.bits) {
+    COUNTER_STEPS(BBLK* bb, const struct LOOP* loop)
+        : live(static_cast<uint32_t>(currfuninfo->lva_sym_count)), is_counter(live.bits) {
+        add_live_at_exit(bb, live);
         for (LIST* s = bb->statements; s; s = s->rest)
             for_each_node(s->first, [&](const NODE* t) {
                 const int bit = t->op == NAME ? live_index(t->u.sym) : -1;
@@ -317,7 +313,7 @@ private:
 } // namespace
 
 void elim_locally_dead_assignments_in_bb(BBLK* bb, struct LOOP* loop) {
-    if (!loop || !loop_callbacks.is_counter || !live_at_exit(bb)) return;
+    if (!loop || !loop_callbacks.is_counter || !live_at_entry_is_known(bb)) return;
     COUNTER_STEPS(bb, loop).block(bb);
     drop_empty_cells(&bb->statements);
 }

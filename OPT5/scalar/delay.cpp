@@ -80,9 +80,8 @@ private:
         if (!currfuninfo->stack_is_laid_out && reads_memory(t->right)) return nullptr;
         BBLK* target = nullptr;
         for (const EDGE* e = bb->successors; e; e = e->rest) {
-            const BITVEC* in = live_at_entry(e->first);
-            if (!in) return nullptr;
-            if (!in->test(static_cast<uint32_t>(bit))) continue;
+            if (!live_at_entry_is_known(e->first)) return nullptr;
+            if (!is_live_at_entry(e->first, bit)) continue;
             if (target) return nullptr;
             target = e->first;
         }
@@ -103,11 +102,10 @@ private:
         insert_before(&target->statements, assignment, cell->psn);
         cell->first = nullptr;
         drop_statement(before ? &before->rest : &bb->statements);
-        BITVEC& in = *live_at_entry(target);
-        in.clear(static_cast<uint32_t>(live_index(assignment->left->u.sym)));
-        for_each_node(assignment->right, [&in](const NODE* t) {
+        set_live_at_entry(target, live_index(assignment->left->u.sym), false);
+        for_each_node(assignment->right, [target](const NODE* t) {
             if (t->op != NAME) return;
-            if (int bit = live_index(t->u.sym); bit >= 0) in.set(static_cast<uint32_t>(bit));
+            if (int bit = live_index(t->u.sym); bit >= 0) set_live_at_entry(target, bit, true);
         });
     }
 

@@ -302,8 +302,7 @@ private:
 
     static bool is_live_into(const SYMTAB* sym, const BBLK* bb) {
         const int n = live_index(sym);
-        const BITVEC* live = live_at_entry(bb);
-        return n < 0 || !live || live->test(static_cast<uint32_t>(n));
+        return n < 0 || !live_at_entry_is_known(bb) || is_live_at_entry(bb, n);
     }
 
     // The edge that is removed must not have been the only one into its target.

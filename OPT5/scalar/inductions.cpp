@@ -251,7 +251,7 @@ bool LOOP_FACTS::is_used_after(const SYMTAB* sym) const {
     if (bit < 0) return true;
     for (const BBLK* bb : loop->blocks)
         for (const EDGE* e = bb->successors; e; e = e->rest)
-            if (!loops.contains(loop, e->first) && live_at_entry(e->first)->test(static_cast<uint32_t>(bit)))
+            if (!loops.contains(loop, e->first) && is_live_at_entry(e->first, bit))
                 return true;
     return false;
 }

@@ -2,7 +2,8 @@
 //
 // A candidate is a local scalar that is read and written by its NAME alone: its address is not taken, it is not
 // volatile, and no exception entry names it. The sets are the least solution of
-//   live_out(b) = union of live_in(s) over the successors s,   live_in(b) = use(b) | (live_out(b) - def(b)).
+//   live_out(b) = union of live_in(s) over the successors s,   live_in(b) = use(b) | (live_out(b) - def(b)),
+// of which live_in is kept.
 //
 // Needs: alias marks. Leaves: every fact; symbols are split anew, and a statement that is a COMMAOP becomes two.
 // Sound because what is not a candidate counts as live everywhere: a variable that a pointer reaches could be read by
@@ -13,7 +14,6 @@
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
-#include "OPT5/ir/dataflow.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
@@ -68,37 +68,89 @@ void split_statements() {
         }
 }
 
+// What a block reads of what it was entered with, and what it assigns whatever happens.
 class USE_DEF_WALK final : public BACKWARD_WALK {
 public:
-    USE_DEF_WALK(BITVEC* use_set, BITVEC* def_set) : use(use_set), def(def_set) {}
+    explicit USE_DEF_WALK(uint32_t bits) : use(bits), def(bits) {}
+
+    // Calls `visit(bit, reads, assigns)` for every candidate that the block reads or assigns.
+    template <class F>
+    void run(BBLK* bb, const F& visit) {
+        block(bb);
+        for (uint32_t bit : touched) {
+            visit(bit, use.test(bit), def.test(bit));
+            use.clear(bit);
+            def.clear(bit);
+        }
+        touched.clear();
+    }
 
 private:
-    void read(int bit) override { use->set(static_cast<uint32_t>(bit)); }
+    void touch(uint32_t bit) {
+        if (!use.test(bit) && !def.test(bit)) touched.push_back(bit);
+    }
+    void read(int bit) override {
+        touch(static_cast<uint32_t>(bit));
+        use.set(static_cast<uint32_t>(bit));
+    }
     bool write(int bit, bool kills) override {
         if (kills) {
-            use->clear(static_cast<uint32_t>(bit));
-            def->set(static_cast<uint32_t>(bit));
+            touch(static_cast<uint32_t>(bit));
+            use.clear(static_cast<uint32_t>(bit));
+            def.set(static_cast<uint32_t>(bit));
         }
         return true;
     }
-    BITVEC *use, *def;
-};
 
-struct USE_DEF {
     BITVEC use, def;
+    std::vector<uint32_t> touched;
 };
 
-void solve(uint32_t bits) {
-    SIDE_TABLE<USE_DEF> sets({BITVEC(bits), BITVEC(bits)});
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) USE_DEF_WALK(&sets[bb].use, &sets[bb].def).block(bb);
-    const DATAFLOW live(FLOW::BACKWARD, MEET::UNION, BITVEC(bits), [&](const BBLK* bb, BITVEC& set) {
-        set -= sets[bb].def;
-        set |= sets[bb].use;
-    });
-    currfuninfo->live_sets = std::make_unique<LIVE_SETS>();
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        currfuninfo->live_sets->of[bb] = {live.at_entry(bb), live.at_exit(bb)};
-}
+// One candidate after the other: from the blocks that read it back over the edges, up to those that assign it. That takes
+// as long as the sets are large, where equations over bit vectors take the product of blocks and candidates.
+class LIVENESS {
+public:
+    explicit LIVENESS(size_t count) : read_in(count), assigned_in(count) {}
+
+    void run() {
+        FUNINFO* f = currfuninfo;
+        USE_DEF_WALK walk(static_cast<uint32_t>(read_in.size()));
+        f->live_sets = std::make_unique<LIVE_SETS>();
+        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
+            f->live_sets->at_entry[bb].is_known = true;
+            walk.run(bb, [&](uint32_t bit, bool reads, bool assigns) {
+                if (reads) read_in[bit].push_back(bb);
+                if (assigns) assigned_in[bit].push_back(bb);
+            });
+        }
+        for (size_t bit = 0; bit < read_in.size(); ++bit) spread(static_cast<uint16_t>(bit));
+    }
+
+private:
+    void spread(uint16_t bit) {
+        for (const BBLK* bb : assigned_in[bit]) ends_at[bb] = bit;
+        std::vector<const BBLK*>& waiting = read_in[bit];
+        for (const BBLK* bb : waiting) enter(bb, bit);
+        while (!waiting.empty()) {
+            const BBLK* bb = waiting.back();
+            waiting.pop_back();
+            for (const EDGE* e = bb->predecessors; e; e = e->rest)
+                if (ends_at[e->first] != bit && entered[e->first] != bit) {
+                    enter(e->first, bit);
+                    waiting.push_back(e->first);
+                }
+        }
+    }
+
+    void enter(const BBLK* bb, uint16_t bit) {
+        entered[bb] = bit;
+        currfuninfo->live_sets->at_entry[bb].live.push_back(bit);
+    }
+
+    std::vector<std::vector<const BBLK*>> read_in, assigned_in; // by bit
+    // By block: the last candidate that it assigns, and that is live at its entry, of those looked at so far.
+    SIDE_TABLE<uint16_t> ends_at{NOT_A_CANDIDATE}, entered{NOT_A_CANDIDATE};
+};
 
 } // namespace
 
@@ -111,7 +163,7 @@ void find_live_variables() {
     need(fact::alias_marks);
     number_candidates();
     if (f->lva_sym_count == 0) return;
-    solve(static_cast<uint32_t>(f->lva_sym_count));
+    LIVENESS(static_cast<size_t>(f->lva_sym_count)).run();
 }
 
 void lva_cleanup() {

@@ -161,13 +161,13 @@ private:
     void place_joins() {
         std::vector<int> placed(frontier.size(), NONE);
         for (size_t v = 0; v < variables.size(); ++v) {
-            const auto bit = static_cast<uint32_t>(live_index(variables[v].sym));
+            const int bit = live_index(variables[v].sym);
             std::vector<BBLK*> work = variables[v].assigned_in;
             while (!work.empty()) {
                 const BBLK* from = work.back();
                 work.pop_back();
                 for (BBLK* bb : frontier[index(from)]) {
-                    if (placed[index(bb)] == static_cast<int>(v) || !live_at_entry(bb)->test(bit)) continue;
+                    if (placed[index(bb)] == static_cast<int>(v) || !is_live_at_entry(bb, bit)) continue;
                     placed[index(bb)] = static_cast<int>(v);
                     joins[index(bb)].push_back({static_cast<int>(v), new_value()});
                     work.push_back(bb);

@@ -4,39 +4,61 @@
 
 namespace {
 
-LIVE_SETS::ENTRY* entry_of(const BBLK* bb) {
-    LIVE_SETS* sets = bb->owner()->live_sets.get();
+LIVE_SETS::ENTRY* entry_of(LIVE_SETS* sets, const BBLK* bb) {
     return sets && sets->at_entry[bb].is_known ? &sets->at_entry[bb] : nullptr;
+}
+
+LIVE_SETS* sets_of(const BBLK* bb) { return bb->owner()->live_sets.get(); }
+
+// A copy of the list at the end of all; where it starts.
+uint32_t copy_to_end(std::vector<uint16_t>& lists, const LIVE_SETS::ENTRY& list) {
+    const auto from = static_cast<uint32_t>(lists.size());
+    lists.resize(from + list.count);
+    std::copy_n(lists.begin() + list.from, list.count, lists.begin() + from);
+    return from;
 }
 
 } // namespace
 
-bool live_at_entry_is_known(const BBLK* bb) { return entry_of(bb) != nullptr; }
+bool live_at_entry_is_known(const BBLK* bb) { return entry_of(sets_of(bb), bb) != nullptr; }
 
 bool is_live_at_entry(const BBLK* bb, int bit) {
-    const std::vector<uint16_t>& live = entry_of(bb)->live;
-    return std::binary_search(live.begin(), live.end(), bit);
+    LIVE_SETS* sets = sets_of(bb);
+    const LIVE_SETS::ENTRY& entry = *entry_of(sets, bb);
+    const auto first = sets->lists.begin() + entry.from;
+    return std::binary_search(first, first + entry.count, bit);
 }
 
 void set_live_at_entry(const BBLK* bb, int bit, bool is_live) {
-    std::vector<uint16_t>& live = entry_of(bb)->live;
-    const auto at = std::lower_bound(live.begin(), live.end(), bit);
-    const bool was_live = at != live.end() && *at == bit;
-    if (is_live && !was_live) live.insert(at, static_cast<uint16_t>(bit));
-    if (!is_live && was_live) live.erase(at);
+    LIVE_SETS* sets = sets_of(bb);
+    LIVE_SETS::ENTRY& entry = *entry_of(sets, bb);
+    auto first = sets->lists.begin() + entry.from;
+    const auto place = std::lower_bound(first, first + entry.count, bit) - first;
+    const bool was_live = place < entry.count && first[place] == bit;
+    if (is_live == was_live) return;
+    if (is_live) {
+        entry.from = copy_to_end(sets->lists, entry);
+        sets->lists.insert(sets->lists.begin() + entry.from + place, static_cast<uint16_t>(bit));
+        ++entry.count;
+    } else {
+        std::copy(first + place + 1, first + entry.count, first + place);
+        --entry.count;
+    }
 }
 
 void add_live_at_exit(const BBLK* bb, BITVEC& live) {
+    LIVE_SETS* sets = sets_of(bb);
     for (const EDGE* e = bb->successors; e; e = e->rest) {
-        const LIVE_SETS::ENTRY* entry = entry_of(e->first);
+        const LIVE_SETS::ENTRY* entry = entry_of(sets, e->first);
         if (!entry) return live.set_all();
-        for (uint16_t bit : entry->live) live.set(bit);
+        for (uint32_t i = 0; i < entry->count; ++i) live.set(sets->lists[entry->from + i]);
     }
 }
 
 void copy_live_at_entry(const BBLK* bb, const BBLK* made) {
-    if (const LIVE_SETS::ENTRY* entry = entry_of(bb)) {
-        LIVE_SETS::ENTRY copy = *entry;
-        bb->owner()->live_sets->at_entry[made] = std::move(copy);
-    }
+    LIVE_SETS* sets = sets_of(bb);
+    const LIVE_SETS::ENTRY* entry = entry_of(sets, bb);
+    if (!entry) return;
+    const LIVE_SETS::ENTRY copy{copy_to_end(sets->lists, *entry), entry->count, true};
+    sets->at_entry[made] = copy;
 }

@@ -12,10 +12,11 @@
 
 struct LIVE_SETS {
     struct ENTRY {
-        bool is_known = false;      // not of a block that was made since
-        std::vector<uint16_t> live; // ascending
+        uint32_t from = 0, count = 0; // in `lists`
+        bool is_known = false;        // not of a block that was made since
     };
     SIDE_TABLE<ENTRY> at_entry;
+    std::vector<uint16_t> lists; // those of the blocks, each ascending; a list that grows moves to the end
 };
 
 bool live_at_entry_is_known(const BBLK* bb);

@@ -23,6 +23,7 @@
 #include "OPT5/simp/simp.h"
 #include "UTIL/abort.h"
 
+#include <numeric>
 #include <vector>
 
 int live_index(const SYMTAB* sym) {
@@ -110,44 +111,86 @@ private:
 // as long as the sets are large, where equations over bit vectors take the product of blocks and candidates.
 class LIVENESS {
 public:
-    explicit LIVENESS(size_t count) : read_in(count), assigned_in(count) {}
+    explicit LIVENESS(size_t count) : count(count) {}
 
     void run() {
-        FUNINFO* f = currfuninfo;
-        USE_DEF_WALK walk(static_cast<uint32_t>(read_in.size()));
-        f->live_sets = std::make_unique<LIVE_SETS>();
-        for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
-            f->live_sets->at_entry[bb].is_known = true;
-            walk.run(bb, [&](uint32_t bit, bool reads, bool assigns) {
-                if (reads) read_in[bit].push_back(bb);
-                if (assigns) assigned_in[bit].push_back(bb);
-            });
+        const std::vector<MENTION> mentions = by_bit();
+        auto m = mentions.begin();
+        for (size_t bit = 0; bit < count; ++bit) {
+            const auto first = m;
+            while (m != mentions.end() && m->bit == bit) ++m;
+            spread(&*first, static_cast<size_t>(m - first));
         }
-        for (size_t bit = 0; bit < read_in.size(); ++bit) spread(static_cast<uint16_t>(bit));
+        make_lists();
     }
 
 private:
-    void spread(uint16_t bit) {
-        for (const BBLK* bb : assigned_in[bit]) ends_at[bb] = bit;
-        std::vector<const BBLK*>& waiting = read_in[bit];
-        for (const BBLK* bb : waiting) enter(bb, bit);
+    struct MENTION {
+        BBLK* bb;
+        uint16_t bit;
+        bool reads, assigns;
+    };
+
+    std::vector<MENTION> by_bit() const {
+        std::vector<MENTION> found;
+        std::vector<size_t> next(count + 1, 0); // by bit: where its mentions begin, then where the next one stands
+        USE_DEF_WALK walk(static_cast<uint32_t>(count));
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            walk.run(bb, [&](uint32_t bit, bool reads, bool assigns) {
+                found.push_back({bb, static_cast<uint16_t>(bit), reads, assigns});
+                ++next[bit + 1];
+            });
+        std::partial_sum(next.begin(), next.end(), next.begin());
+        std::vector<MENTION> sorted(found.size());
+        for (const MENTION& m : found) sorted[next[m.bit]++] = m;
+        return sorted;
+    }
+
+    void spread(const MENTION* mentions, size_t n) {
+        for (size_t i = 0; i < n; ++i)
+            if (mentions[i].assigns) ends_at[mentions[i].bb] = mentions[i].bit;
+        for (size_t i = 0; i < n; ++i)
+            if (mentions[i].reads) enter(mentions[i].bb, mentions[i].bit);
         while (!waiting.empty()) {
-            const BBLK* bb = waiting.back();
+            const auto [bb, bit] = waiting.back();
             waiting.pop_back();
             for (const EDGE* e = bb->predecessors; e; e = e->rest)
-                if (ends_at[e->first] != bit && entered[e->first] != bit) {
-                    enter(e->first, bit);
-                    waiting.push_back(e->first);
-                }
+                if (ends_at[e->first] != bit && entered[e->first] != bit) enter(e->first, bit);
         }
     }
 
     void enter(const BBLK* bb, uint16_t bit) {
         entered[bb] = bit;
-        currfuninfo->live_sets->at_entry[bb].live.push_back(bit);
+        live.push_back({bb, bit});
+        waiting.push_back({bb, bit});
     }
 
-    std::vector<std::vector<const BBLK*>> read_in, assigned_in; // by bit
+    void make_lists() const {
+        auto sets = std::make_unique<LIVE_SETS>();
+        for (const LIVE& l : live) ++sets->at_entry[l.bb].count;
+        uint32_t from = 0;
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            LIVE_SETS::ENTRY& entry = sets->at_entry[bb];
+            entry.is_known = true;
+            entry.from = from;
+            from += entry.count;
+            entry.count = 0;
+        }
+        sets->lists.resize(from);
+        for (const LIVE& l : live) {
+            LIVE_SETS::ENTRY& entry = sets->at_entry[l.bb];
+            sets->lists[entry.from + entry.count++] = l.bit;
+        }
+        currfuninfo->live_sets = std::move(sets);
+    }
+
+    struct LIVE {
+        const BBLK* bb;
+        uint16_t bit;
+    };
+    const size_t count;
+    std::vector<LIVE> live; // at the entries of blocks, by ascending bits
+    std::vector<LIVE> waiting;
     // By block: the last candidate that it assigns, and that is live at its entry, of those looked at so far.
     SIDE_TABLE<uint16_t> ends_at{NOT_A_CANDIDATE}, entered{NOT_A_CANDIDATE};
 };

@@ -501,10 +501,6 @@ const std::string& map_name(TYPE* t);
 // All types that hang from `root`, itself first, in tree order: a type, then what is built on it, by map name, then by
 // age.
 std::vector<TYPE*> type_tree_order(TYPE* root);
-// Dies with "Type contains itself:  check_csu_nesting()" if a structure below `root` is, however deep, a part of
-// itself. Holds for every type that a language can declare; input that breaks it would send a walk over members round
-// for ever.
-void check_csu_nesting(TYPE* root);
 bool type_is_tagless(const TYPE* t);
 bool exact_types(const TYPE* a, const TYPE* b);
 bool compatible_types(const TYPE* a, const TYPE* b, bool strict);

@@ -9,7 +9,6 @@
 
 #include <cstdlib>
 #include <cstring>
-#include <unordered_set>
 
 namespace {
 
@@ -371,27 +370,6 @@ void dump_payload(FILE* out, const NODE* t) {
 }
 
 } // namespace
-
-// The operand of a CSE_DUPE is its original's, and so shared by design.
-static int count_shared(const NODE* t, std::unordered_set<const NODE*>& seen, FILE* out) {
-    int n = 0;
-    for (; t; t = t->left) {
-        if (!seen.insert(t).second) {
-            fprintf(out, "Warning:  node %p (%s) is shared\n", static_cast<const void*>(t), opname(t->op));
-            return n + 1;
-        }
-        if (t->op == CSE_DUPE) return n;
-        n += count_shared(t->right, seen, out);
-    }
-    return n;
-}
-
-int report_shared_nodes(const LIST* list) {
-    std::unordered_set<const NODE*> seen; // membership only
-    int n = 0;
-    for (; list; list = list->rest) n += count_shared(list->first, seen, fdebug ? fdebug : stderr);
-    return n;
-}
 
 std::string tree_to_infix(const NODE* t) {
     infix_writer w;

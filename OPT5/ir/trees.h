@@ -144,9 +144,6 @@ NODE* rewrite_tree(NODE* t, F&& rewrite) {
     return rewrite(t);
 }
 
-// ---- Checks. Reports every node of the statements that has two parents, to the debug stream or stderr; their number.
-int report_shared_nodes(const LIST* list);
-
 // ---- Text
 std::string tree_to_infix(const NODE* t);                  // C-like, parentheses by precedence
 std::string stmt2infix(const NODE* t);                     // as a statement

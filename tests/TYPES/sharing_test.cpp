@@ -133,23 +133,6 @@ TEST_F(Types, MergeOfDeclarationAndDefinition) {
     EXPECT_FALSE(find_equivalent_type(structure("T", member("a", pkg.long_t, 0))));
 }
 
-TEST_F(Types, StructureInItself) {
-    TYPE* a = pkg.mk_struct("A", 32, 32, false);
-    TYPE* b = pkg.mk_struct("B", 32, 32, false);
-    pkg.set_mdata(a, member("b", pkg.mk_array(b, false, 1, true), 0));
-    pkg.set_mdata(b, member("p", pkg.mk_ptr(a), 0));
-    TYPE *ca = a, *cb = b;
-    pkg.type_frozen(ca);
-    pkg.type_frozen(cb);
-    EXPECT_NO_THROW(check_csu_nesting(TYPE_PKG::root_type));
-    TYPE* c = pkg.mk_struct("C", 32, 32, false);
-    TYPE* d = structure("D", member("c", c, 0));
-    pkg.set_mdata(c, member("d", pkg.mk_array(d, false, 1, true), 0));
-    pkg.type_frozen(c);
-    EXPECT_DIES(check_csu_nesting(TYPE_PKG::root_type), "Type contains itself:  check_csu_nesting()");
-    EXPECT_FALSE(c->has_flex_array_member());
-}
-
 TEST_F(Types, DeleteTree) {
     TYPE* s = structure("S", nullptr);
     pkg.mk_ptr(s, 16, 16);

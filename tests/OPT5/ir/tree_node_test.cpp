@@ -83,16 +83,6 @@ TEST_F(TreeNode, ErasingTwiceIsReported) {
 }
 #endif
 
-TEST_F(TreeNode, SharedNodesAreReported) {
-    NODE *shared = icon(1), *sum = bin(PLUS, shared, icon(2));
-    LIST* list = mkelist(sum, mkelist(un(UMINUS, shared), nullptr, nullptr), nullptr);
-    testing::internal::CaptureStderr();
-    EXPECT_EQ(report_shared_nodes(list), 1);
-    EXPECT_NE(testing::internal::GetCapturedStderr().find("(ICON) is shared\n"), std::string::npos);
-    list->rest->first->left = icon(1);
-    EXPECT_EQ(report_shared_nodes(list), 0);
-}
-
 TEST_F(TreeNode, InfixText) {
     NODE *a = name(symbol("a", tp->int_t)), *b = name(symbol("b", tp->int_t)),
          *p = name(symbol("p", tp->mk_ptr(tp->int_t)));

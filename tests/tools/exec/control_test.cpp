@@ -62,6 +62,12 @@ struct PROMISE_ROW {
     int64_t count;
     const char* fault; // null: the promise is kept
 };
+// The name of a row: a record shows nothing of itself but its bytes, which hold addresses.
+void PrintTo(const PROMISE_ROW& row, std::ostream* out) {
+    *out << row.keyword;
+    for (const std::string& number : row.promise) *out << ' ' << (number.empty() ? "-" : number);
+    *out << ", " << row.count << " iterations";
+}
 class PromiseTest : public ControlTest, public testing::WithParamInterface<PROMISE_ROW> {};
 
 TEST_P(PromiseTest, IsHeldAgainstTheRun) {

@@ -3,6 +3,7 @@
 #include "OPT5/ir/symbol_maps.h"
 
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
 #include "UTIL/abort.h"
 
 #include <algorithm>
@@ -120,10 +121,9 @@ SPMAP::SPINFO SPMAP::pointee_of(const NODE* p) const {
             continue;
         }
         case UAND: {
-            const NODE* object = p->left;
-            for (; object->op == STDOT; object = object->left)
-                if (object->right && object->right->mval)
-                    offset = offset + INT65(static_cast<int64_t>(object->right->mval->offset >> 4));
+            int64_t bits = 0;
+            const NODE* object = without_members(static_cast<const NODE*>(p->left), &bits);
+            offset = offset + INT65(bits >> 4);
             if (object->op == UMULT && !object->right) { // the address of what a pointer points to
                 p = object->left;
                 continue;

@@ -6,6 +6,7 @@
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 
 namespace {
 
@@ -119,14 +120,11 @@ NODE* lookup_autoinit(const SYMTAB* sym, uint64_t offset_bits, TYPE* type) {
 }
 
 NODE* lookup_autoinit(const NODE* tree) {
-    uint64_t offset = 0;
+    int64_t offset = 0;
     TYPE* type = tree->type;
-    for (; tree->op == STDOT; tree = tree->left) {
-        if (!tree->right || tree->right->op != FIELD || !tree->right->mval) return nullptr;
-        offset += static_cast<uint64_t>(tree->right->mval->offset);
-    }
+    tree = without_members(tree, &offset);
     if (tree->op == UMULT && !tree->right && tree->left->op == UAND) tree = tree->left->left;
-    return tree->op == NAME ? lookup_autoinit(tree->u.sym, offset, type) : nullptr;
+    return tree->op == NAME ? lookup_autoinit(tree->u.sym, static_cast<uint64_t>(offset), type) : nullptr;
 }
 
 NODE* lookup_array_autoinit(const SYMTAB* sym, uint64_t i) {

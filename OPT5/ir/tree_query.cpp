@@ -327,9 +327,9 @@ static INT65 constant_terms(const NODE* t, int* rest) {
             return truncate_to_type(t->left->u.lval * t->right->u.lval, t->type);
         break;
     case UAND: {
-        INT65 sum;
-        const NODE* object = t->left;
-        for (; object->op == STDOT; object = object->left) sum += member_offset(object);
+        int64_t bits = 0;
+        const NODE* object = without_members(static_cast<const NODE*>(t->left), &bits);
+        const INT65 sum(bits >> 4);
         if (object->op == STREF) return sum + member_offset(object) + constant_terms(object->left, rest);
         if (object->op == UMULT && !object->right) return sum + constant_terms(object->left, rest);
         ++*rest;
@@ -341,9 +341,10 @@ static INT65 constant_terms(const NODE* t, int* rest) {
 }
 
 static INT65 constant_offset(const NODE* t, int* rest) {
-    INT65 sum;
     while (is_transparent(t->op)) t = t->left;
-    for (; t->op == STDOT; t = t->left) sum += member_offset(t);
+    int64_t bits = 0;
+    t = without_members(t, &bits);
+    const INT65 sum(bits >> 4);
     if (t->op == STREF) return sum + member_offset(t) + constant_terms(t->left, rest);
     if (t->op == UMULT) return sum + constant_terms(t->left, rest);
     if (t->type->is_pointer()) return sum + constant_terms(t, rest);

@@ -94,3 +94,10 @@ N* without_members(N* t) {
     while (t->op == STDOT) t = t->left;
     return t;
 }
+
+// The same; `*offset` grows by where the members lie in what is returned, in bits.
+template <class N>
+N* without_members(N* t, int64_t* offset) {
+    for (; t->op == STDOT; t = t->left) *offset += static_cast<int64_t>(t->right->mval->offset);
+    return t;
+}

@@ -17,6 +17,7 @@
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/scalar/structure_copy.h"
 #include "OPT5/simp/simp.h"
@@ -102,7 +103,7 @@ private:
     // The candidate that an access chain lies in, and the offset in it; null for another tree.
     CANDIDATE* candidate_of(const NODE* t, int64_t* offset = nullptr) {
         int64_t sum = 0;
-        for (; t->op == STDOT && t->right && t->right->mval; t = t->left) sum += t->right->mval->offset;
+        t = without_members(t, &sum);
         if (t->op != NAME) return nullptr;
         auto found = index_of.find(t->u.sym);
         if (found == index_of.end()) return nullptr;

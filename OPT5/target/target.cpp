@@ -7,6 +7,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 
 #include <cstdio>
 
@@ -106,12 +107,10 @@ NODE* address_of_indirection(NODE* t) {
 
 // &x.f is &x and the offsets of the members.
 NODE* address_of_member(NODE* t) {
-    INT65 offset;
-    NODE* base = t->left;
-    for (; base->op == STDOT; base = base->left) {
-        if (!base->right || !base->right->mval || base->right->mval->is_bitfld) return t;
-        offset += INT65(base->right->mval->offset >> 4);
-    }
+    if (t->left->op == STDOT && t->left->right->mval->is_bitfld) return t;
+    int64_t bits = 0;
+    NODE* base = without_members(t->left, &bits);
+    const INT65 offset(bits >> 4);
     if (!offset_is_in_range(offset, t->type, 0) || (base->op != NAME && base->op != UMULT) || base->right) return t;
     while (t->left != base) {
         NODE* member = t->left;

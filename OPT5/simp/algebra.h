@@ -28,6 +28,8 @@ NODE* simp_float_MULT(NODE* t, struct LOOP* loop);
 NODE* simp_float_DIV(NODE* t, struct LOOP* loop);
 NODE* simp_float_unary(NODE* t); // UMINUS
 NODE* simp_RECIP(NODE* t, struct LOOP* loop);
+// Of a cast to the short format, or null: computed there.
+NODE* compute_in_short_format(NODE* t, struct LOOP* loop);
 
 // ---- Truth values
 NODE* simp_relop(NODE* t, struct LOOP* loop);

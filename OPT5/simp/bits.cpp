@@ -167,23 +167,25 @@ NODE* common_shift_outward(NODE* t, struct LOOP* loop) {
     return simp_node(l, loop);
 }
 
-// (T)x op (T)y, and (T)x & c with c in x's own bits: the operator is as well applied to what is cast.
+// (T)x op (T)y, and (T)x op c: the operator is as well applied to what is cast, with a constant that it has the bits
+// of.
 NODE* cast_outward(NODE* t, struct LOOP* loop) {
     NODE *l = t->left, *r = t->right;
     if (l->op != SCONV || !is_integer(l->left->type) || is_bitfield_access(l->left)) return nullptr;
-    TYPE *narrow = l->left->type->stqs(), *type = t->type;
-    if (narrow->size < tp->int_t->size || narrow->size >= type->size) return nullptr;
+    TYPE *from = l->left->type->stqs(), *type = t->type;
+    if (from->size < tp->int_t->size || from->size > type->size) return nullptr;
     if (is_icon(r)) {
-        const uint64_t below = narrow->is_unsigned() ? mask_of(narrow) : mask_of(narrow) >> 1;
-        if (t->op != ANDB || (bits_of(r) & ~below) != 0) return nullptr;
-        r->type = narrow;
+        const bool same_bits = from->size == type->size;
+        const uint64_t below = is_signed(from) ? mask_of(from) >> 1 : mask_of(from);
+        if (!same_bits && (t->op != ANDB || (bits_of(r) & ~below) != 0)) return nullptr;
+        r->type = from;
         set_icon(r, r->u.lval);
-    } else if (r->op == SCONV && same_integers(r->left->type, narrow) && !is_bitfield_access(r->left)) {
+    } else if (r->op == SCONV && same_integers(r->left->type, from) && !is_bitfield_access(r->left)) {
         r = take_left(r);
     } else {
         return nullptr;
     }
-    l->left = made(t->op, l->left, r, narrow, loop);
+    l->left = made(t->op, l->left, r, from, loop);
     erase_node(t);
     return coerce_to_type(type, simp_node(l, loop));
 }
@@ -252,6 +254,13 @@ NODE* negated_sign_test(NODE* t, struct LOOP* loop) {
 
 NODE* complement_sum(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
+    if (is_equal_width_cast(inner)) { // ~(T)x is (T)~x
+        TYPE* type = t->type;
+        NODE* x = take_left(inner);
+        erase_node(t);
+        TYPE* from = x->type->stqs();
+        return coerced(type, made(NOTB, x, nullptr, from, loop), loop);
+    }
     if (is_unary(inner, UMINUS)) { // ~-x is x - 1
         NODE* x = take_left(inner);
         return simp_node(to_binary(t, PLUS, x, icon_of(INT65(-1), t)), loop);

@@ -99,29 +99,33 @@ NODE* mask_for_MOD(NODE* t, struct LOOP* loop) {
     return simp_for_control(simp_node(t, loop), loop);
 }
 
-NODE* test_of_bit(NODE* shift, int n, struct LOOP* loop) {
+// The bits of `mask`, where the shift has them, as they lie in its operand.
+NODE* test_of_bits(NODE* shift, uint64_t mask, struct LOOP* loop) {
     TYPE* type = shift->type->stqs();
-    NODE* x = shift->left;
+    NODE *x = shift->left, *c = mk_ICON(INT65(0), type);
+    set_icon(c, INT65(0, mask << shift_count_of(shift)));
     erase_node(shift->right);
     erase_node(shift);
-    return made(ANDB, x, mk_ICON(INT65(1) << INT65(n), type), type, loop);
+    return made(ANDB, x, c, type, loop);
 }
 
-// (x >> n) & 1, also with a narrowing cast between, and x >> (width - 1), look at one bit.
+// (x >> n) & c, also with a narrowing cast between, and x >> (width - 1), look at some bits of x.
 NODE* mask_for_shift(NODE* t, struct LOOP* loop) {
     if (t->op == SRL) {
         const int n = shift_count_of(t);
-        return n && n == static_cast<int>(t->type->size) - 1 ? test_of_bit(t, n, loop) : nullptr;
+        return n && n == static_cast<int>(t->type->size) - 1 ? test_of_bits(t, 1, loop) : nullptr;
     }
-    if (!is_node(t, ANDB) || !is_icon(t->right, INT65(1))) return nullptr;
+    if (!is_node_with_icon(t, ANDB)) return nullptr;
     NODE* shift = t->left;
     if (shift->op == SCONV && is_integer(shift->left->type)) shift = shift->left;
     const int n = shift->op == SRL ? shift_count_of(shift) : 0;
-    if (!n || (n >= SHORT_MASK && promoted_type(shift->type)->size > SHORT_MASK)) return nullptr;
+    const uint64_t c = bits_of(t->right), room = mask_of(shift->type) >> n;
+    if (!n || (c & ~room) != 0) return nullptr;
+    if ((c << n) >> SHORT_MASK && promoted_type(shift->type)->size > SHORT_MASK) return nullptr;
     if (shift != t->left) erase_node(t->left);
     erase_node(t->right);
     erase_node(t);
-    return test_of_bit(shift, n, loop);
+    return test_of_bits(shift, c, loop);
 }
 
 // (x ^ m) & p with the single bit p inside m: (x & p) ^ p.

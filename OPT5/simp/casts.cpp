@@ -45,12 +45,27 @@ NODE* narrow_under_cast(NODE* t, struct LOOP* loop) {
     return narrow_to_mask(&t->left, mask_of(t->type)) ? simp_node(t, loop) : nullptr;
 }
 
+// A complement, negation or shift to the left by a constant whose result is cut to a narrower type: computed there.
+NODE* compute_unary_narrow(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    TYPE* type = t->type->stqs();
+    const bool shifts =
+        inner->op == SLL && shift_count_of(inner) && shift_count_of(inner) < static_cast<int>(type->size);
+    if (!shifts && !is_unary(inner, NOTB) && !is_unary(inner, UMINUS)) return nullptr;
+    TYPE* computed = inner->op == UMINUS && is_signed(type) ? tp->mk_unsigned(type) : type;
+    inner->left = coerced(computed, inner->left, loop);
+    inner->type = computed;
+    erase_node(t);
+    return coerced(type, simp_node(inner, loop), loop);
+}
+
 // An operator whose result is cut to a narrower type: computed there. One operand of an operator on bits may be any
 // with a constant beside it; other operators, which wrap in the narrower type, compute in its unsigned form.
 NODE* compute_narrow(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
     TYPE *type = t->type->stqs(), *wide = inner->type;
     if (!is_integer(type) || type->size < tp->int_t->size || type->size >= wide->size) return nullptr;
+    if (NODE* r = compute_unary_narrow(t, loop)) return r;
     const bool bitwise = inner->op == ANDB || inner->op == ORB || inner->op == XORB;
     const bool wraps = inner->op == PLUS || inner->op == MINUS || inner->op == MULT;
     if ((!bitwise && !wraps) || !operands_have_type(inner)) return nullptr;
@@ -105,8 +120,8 @@ NODE* cast_of_exact_sum(NODE* t, struct LOOP* loop) {
     return made(PLUS, simp_node(t, loop), mk_ICON(c, type), type, loop);
 }
 
-const RULE cast_rules[] = {integer_cast_of_cast, floating_cast_of_cast, narrow_under_cast, compute_narrow,
-                           cast_of_exact_sum};
+const RULE cast_rules[] = {integer_cast_of_cast, floating_cast_of_cast, narrow_under_cast,
+                           compute_narrow,       cast_of_exact_sum,     compute_in_short_format};
 
 } // namespace
 

@@ -199,6 +199,11 @@ TYPE* signed_form(TYPE* t) {
     return is_signed(t) ? t : t == tp->uint_t ? tp->int_t : t == tp->ulong_t ? tp->long_t : tp->llong_t;
 }
 
+bool is_pointer_difference(const NODE* t) {
+    return t->op == MINUS && t->left->type->is_pointer() && t->right->type->is_pointer() &&
+           t->left->type->size == t->type->size && t->right->type->size == t->type->size;
+}
+
 // Tests against zero, and of one bit.
 NODE* test_against_zero(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
@@ -212,7 +217,7 @@ NODE* test_against_zero(NODE* t, struct LOOP* loop) {
         return simp_node(t, loop);
     }
     // x - y == 0, x ^ y == 0
-    if (is_node(inner, MINUS) || is_node(inner, XORB)) {
+    if (is_node(inner, MINUS) || is_node(inner, XORB) || is_pointer_difference(inner)) {
         erase_node(t->right);
         t->left = inner->left;
         t->right = take_right(inner);
@@ -362,25 +367,50 @@ bool is_null(const NODE* t) {
     return is_icon(t, INT65(0));
 }
 
-NODE* compare_pointers(NODE* t, struct LOOP* loop) {
-    NODE *l = t->left, *r = t->right;
-    if (same_value(l, r)) return decided(t, holds_for_equals(t->op));
-    if (!is_equality(t)) return t;
-    if (is_null(r) && pointer_contains_adcon_term(l)) return decided(t, t->op == NEQ);
-    if (l->type->size == r->type->size) {
-        LINEAR_VALUE difference(l, loop);
-        difference.subtract(r);
-        if (difference.is_constant()) return decided(t, difference.constant_is(INT65(0)) == (t->op == EQ));
+// The place that a first member begins with.
+const NODE* place_of_first_member(const NODE* place) {
+    while (place->op == STDOT && place->right->mval && place->right->mval->offset == 0 && !is_bitfield_access(place))
+        place = place->left;
+    return place;
+}
+
+// What p is the address of, or the pointer that it is the value of, below casts and first members.
+struct ORIGIN {
+    const NODE* node;
+    bool is_object;
+};
+
+ORIGIN origin_of(const NODE* p) {
+    for (;;) {
+        const NODE* place = p->op == UAND ? place_of_first_member(p->left) : nullptr;
+        if (place && place->op == NAME) return {place, true};
+        const bool is_first_member = place && place->op == STREF && place->right->mval &&
+                                     place->right->mval->offset == 0 && !is_bitfield_access(place);
+        if (p->op == PCONV && p->left->type->is_pointer() && p->left->type->size == p->type->size)
+            p = p->left;
+        else if (is_first_member || (place && place->op == UMULT && !place->right))
+            p = place->left;
+        else
+            return {p, false};
     }
-    // p + i == p + j, p + i == p: the offsets decide.
+}
+
+bool addresses_are_same(const NODE* l, const NODE* r) {
+    if (l->type->size != r->type->size || !is_pure(l) || !is_pure(r)) return false;
+    const ORIGIN a = origin_of(l), b = origin_of(r);
+    if (a.is_object || b.is_object) return a.is_object && b.is_object && a.node->u.sym == b.node->u.sym;
+    return (a.node != l || b.node != r) && same_value(a.node, b.node);
+}
+
+bool is_offset_sum(const NODE* p) { return p->op == PLUS && p->left->type->is_pointer() && is_integer(p->right->type); }
+
+// p + i == p + j, p + i == p: the offsets decide.
+NODE* compare_offsets(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
     auto base = [](NODE* p) { return (p->op == PLUS || p->op == MINUS) && p->left->type->is_pointer() ? p->left : p; };
-    auto is_offset_sum = [](const NODE* p) {
-        return p->op == PLUS && p->left->type->is_pointer() && is_integer(p->right->type);
-    };
-    if (!is_offset_sum(l) && !is_offset_sum(r)) return t;
     if ((base(l) != l && !is_offset_sum(l)) || (base(r) != r && !is_offset_sum(r)) || !is_pure(l) || !is_pure(r) ||
         !same_value(base(l), base(r)))
-        return t;
+        return nullptr;
     auto offset = [&](NODE* p) {
         return is_offset_sum(p) ? coerced(tp->long_t, copy_tree(p->right), loop) : mk_ICON(INT65(0), tp->long_t);
     };
@@ -388,6 +418,37 @@ NODE* compare_pointers(NODE* t, struct LOOP* loop) {
     erase_tree(l);
     erase_tree(r);
     return simp_node(to_binary(t, t->op, i, j), loop);
+}
+
+// p + i == q + i: the offset that both are moved by.
+NODE* compare_bases(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (!is_offset_sum(l) || !is_offset_sum(r) || !same_integers(l->right->type, r->right->type) ||
+        !same_value(l->right, r->right))
+        return nullptr;
+    if (!is_pure(r->left)) return nullptr;
+    erase_tree(l->right);
+    erase_tree(r->right);
+    t->left = take_left(l);
+    t->right = take_left(r);
+    return simp_node(t, loop);
+}
+
+NODE* compare_pointers(NODE* t, struct LOOP* loop) {
+    NODE *l = t->left, *r = t->right;
+    if (same_value(l, r)) return decided(t, holds_for_equals(t->op));
+    if (addresses_are_same(l, r)) return decided(t, holds_for_equals(t->op));
+    if (!is_equality(t)) return t;
+    if (is_null(r) && pointer_contains_adcon_term(l)) return decided(t, t->op == NEQ);
+    if (l->type->size == r->type->size) {
+        LINEAR_VALUE difference(l, loop);
+        difference.subtract(r);
+        if (difference.is_constant()) return decided(t, difference.constant_is(INT65(0)) == (t->op == EQ));
+    }
+    if (!is_offset_sum(l) && !is_offset_sum(r)) return t;
+    if (NODE* decision = compare_offsets(t, loop)) return decision;
+    NODE* bases = compare_bases(t, loop);
+    return bases ? bases : t;
 }
 
 void constant_to_the_right(NODE* t) {
@@ -431,7 +492,15 @@ NODE* join_tests_of_zero(NODE* t, struct LOOP* loop) {
 } // namespace
 
 NODE* join_compares(NODE* t, struct LOOP* loop) {
-    return t->op == ANDB || t->op == ORB ? join_tests_of_zero(t, loop) : nullptr;
+    if (t->op == XORB || !op_is_int_compare(t->left->op) || !op_is_int_compare(t->right->op)) return nullptr;
+    if (NODE* r = join_tests_of_zero(t, loop)) return r;
+    // Both are computed, and 0 or 1, so that the logical operator is the one on bits.
+    TYPE* type = t->type;
+    const int op = t->op;
+    t->op = op == ANDB ? ANDAND : OROR;
+    if (NODE* r = join_tests_of_one_value(t, loop)) return coerced(type, r, loop);
+    t->op = op;
+    return nullptr;
 }
 
 NODE* simp_relop(NODE* t, struct LOOP* loop) {

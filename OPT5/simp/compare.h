@@ -10,3 +10,6 @@ NODE* compare_with_interval(NODE* x, INT65 low, INT65 high, bool inside, struct 
 // The compare of a quotient, remainder, shift or product with a constant as a compare of its operand, or null.
 NODE* compare_computed(NODE* t, struct LOOP* loop);
 NODE* join_compares(NODE* t, struct LOOP* loop); // of two compares under ANDB or ORB one, or null
+// The same of two conditions under ANDAND or OROR that look at one value or one pair of values, the second of which is
+// evaluated in any case.
+NODE* join_tests_of_one_value(NODE* t, struct LOOP* loop);

@@ -64,13 +64,36 @@ private:
     NODE* left_only(NODE* t, uint64_t mask, int levels) { return operands(t, mask, levels, false); }
     NODE* both(NODE* t, uint64_t mask, int levels) { return operands(t, mask, levels, true); }
 
+    // Whether an operand has none of the bits of the mask, or all of them, and no effects.
+    static bool is_idle(const NODE* t, uint64_t mask, bool ones) {
+        if (!t->left) return is_icon(t) && (bits_of(t) & mask) == (ones ? mask : 0);
+        const KNOWN_BITS k = known_bits(t);
+        return (mask & ~(ones ? k.ones : k.zeros)) == 0 && is_pure(t);
+    }
+
     NODE* sum(NODE* t, uint64_t mask, int levels) {
-        const bool idle = is_icon(t->right) && (bits_of(t->right) & mask) == 0;
-        return idle ? dropped(only_left(t), mask, levels - 1) : both(t, mask, levels);
+        if (is_idle(t->right, mask, false)) return dropped(only_left(t), mask, levels - 1);
+        if (!is_idle(t->left, mask, false)) return both(t, mask, levels);
+        if (t->op == PLUS) return dropped(only_right(t), mask, levels - 1);
+        if (is_icon(t->left, INT65(0))) return both(t, mask, levels);
+        set_aside(&t->left);
+        return dropped(kept_exact(t, nullptr), mask, levels - 1);
+    }
+
+    // Zero, in place of an operand whose bits do not count.
+    static void set_aside(NODE** link) {
+        NODE* zero = icon_of(INT65(0), *link);
+        erase_tree(*link);
+        *link = zero;
     }
 
     NODE* bit_operator(NODE* t, uint64_t mask, int levels) {
-        if (!is_icon(t->right)) return both(t, mask, levels);
+        if (!is_icon(t->right)) {
+            const bool ones = t->op == ANDB;
+            if (is_idle(t->right, mask, ones)) return dropped(only_left(t), mask, levels - 1);
+            if (is_idle(t->left, mask, ones)) return dropped(only_right(t), mask, levels - 1);
+            return both(t, mask, levels);
+        }
         const uint64_t c = bits_of(t->right);
         const KNOWN_BITS k = known_bits(t->left);
         const bool idle = t->op == ANDB  ? (mask & ~(c | k.zeros)) == 0
@@ -84,6 +107,13 @@ private:
         const int n = shift_count_of(t);
         if (!n) return t;
         if (t->op == SLL) return left_only(t, mask >> n, levels);
+        NODE* inner = t->left;
+        if (inner->op == SLL && shift_count_of(inner) == n &&
+            (mask & ~(mask_of(t->type) >> n)) == 0) { // there and back
+            erase_node(t->right);
+            erase_node(inner->right);
+            return dropped(take_left(take_left(t)), mask, levels - 1);
+        }
         uint64_t below = (mask << n) & mask_of(t->type);
         if (is_signed(t->type) && mask & ~(mask_of(t->type) >> n)) below |= sign_bit(t->type);
         return left_only(t, below, levels);

@@ -169,31 +169,91 @@ bool is_exact_conversion(const NODE* t) {
            t->left->type->size >= tp->int_t->size && !is_bitfield_access(t->left);
 }
 
-// (float)x rel (float)y and (float)x rel c of integers that the format has, with a c that is such an integer.
+// The integer type that holds the values of both, or null.
+TYPE* type_of_both(TYPE* a, TYPE* b) {
+    if (same_integers(a, b)) return a->stqs();
+    TYPE *wide = a->size > b->size ? a : b, *narrow = wide == a ? b : a;
+    if (wide->size == narrow->size) wide = wide->size < tp->long_t->size ? tp->long_t : tp->llong_t;
+    const bool fits = wide->size > narrow->size && (is_signed(wide) || !is_signed(narrow));
+    if (fits) return wide->stqs();
+    return wide->size < tp->llong_t->size ? tp->llong_t : nullptr;
+}
+
+// The integers next to a number, which are one where it is an integer.
+struct NEIGHBOURS {
+    INT65 below, above;
+};
+
+// False for what is no number, or beyond 63 bits.
+bool neighbours(const NODE* number, NEIGHBOURS* n) {
+    const simul_fval& v = *number->u.fval;
+    if (f_is_nan(&v) || f_is_inf(&v)) return false;
+    NODE* c = fold_constants(maketree(SCONV, copy_tree(number), nullptr, tp->llong_t, number->ls)); // toward zero
+    NODE* back = fold_constants(maketree(SCONV, copy_tree(c), nullptr, number->type, number->ls));
+    const bool is_known = c->op == ICON && back->op == FCON;
+    if (is_known) {
+        n->below = n->above = c->u.lval;
+        if (f_lt(back->u.fval, &v)) n->above = n->above + INT65(1);
+        if (f_lt(&v, back->u.fval)) n->below = n->below - INT65(1);
+    }
+    erase_tree(c);
+    erase_tree(back);
+    return is_known;
+}
+
+// x rel c: the relation to an integer next to c, or decided.
+NODE* compare_with_number(NODE* t, int op, NEIGHBOURS n, TYPE* type, struct LOOP* loop) {
+    const bool is_above = n.below >= int_type_max(type) && n.above > int_type_max(type),
+               is_below = n.above <= int_type_min(type) && n.below < int_type_min(type), between = n.below != n.above;
+    const bool less = op == LT || op == ULT || op == LE || op == ULE;
+    if (op == EQ || op == NEQ) {
+        if (between || is_above || is_below) return constant_for(t, INT65(op == NEQ ? 1 : 0));
+    } else if (is_above || is_below) {
+        return constant_for(t, INT65(less == is_above ? 1 : 0));
+    }
+    const bool upward = op == LT || op == GE || op == ULT || op == UGE;
+    erase_tree(t->right);
+    t->right = mk_ICON(upward ? n.above : n.below, type);
+    t->left = take_left(t->left);
+    t->op = op;
+    return simp_node(t, loop);
+}
+
+// (float)x rel (float)y and (float)x rel c of integers that the format has: compared as integers.
 NODE* compare_as_integers(NODE* t, struct LOOP* loop) {
     NODE *l = t->left, *r = t->right;
     if (!is_exact_conversion(l)) return nullptr;
     TYPE* type = l->left->type->stqs();
-    const int op = integer_relop(t->op, type);
-    if (op == ILLOP) return nullptr;
-    if (is_exact_conversion(r) && same_integers(r->left->type, type) && r->type->size == l->type->size) {
-        t->right = take_left(r);
-    } else {
-        if (r->op != FCON) return nullptr;
-        NODE* c = fold_constants(maketree(SCONV, copy_tree(r), nullptr, type, r->ls));
-        NODE* back = fold_constants(maketree(SCONV, copy_tree(c), nullptr, r->type, r->ls));
-        const bool is_integer_constant = c->op == ICON && back->op == FCON && f_eq(back->u.fval, r->u.fval);
-        erase_tree(back);
-        if (!is_integer_constant) {
-            erase_tree(c);
-            return nullptr;
-        }
-        erase_tree(r);
-        t->right = c;
+    if (r->op == FCON) {
+        NEIGHBOURS n;
+        const int op = integer_relop(t->op, type);
+        return op != ILLOP && neighbours(r, &n) ? compare_with_number(t, op, n, type, loop) : nullptr;
     }
-    t->left = take_left(l);
+    if (!is_exact_conversion(r) || r->type->size != l->type->size) return nullptr;
+    type = type_of_both(type, r->left->type);
+    const int op = type ? integer_relop(t->op, type) : ILLOP;
+    if (op == ILLOP) return nullptr;
+    t->left = coerced(type, take_left(l), loop);
+    t->right = coerced(type, take_left(r), loop);
     t->op = op;
     return simp_node(t, loop);
+}
+
+bool widens(const NODE* n) {
+    return n->op == SCONV && n->type->is_float() && n->left->type->is_float() && n->left->type->size < n->type->size;
+}
+
+// The number in a shorter format that has it as an ordinary one; else null.
+NODE* short_constant(const NODE* number, TYPE* narrow) {
+    simul_fval v = *number->u.fval;
+    fp_error = 0;
+    truncate_fval_to_target(&v, narrow);
+    if (fp_error || f_is_nan(&v) || !f_bit_eq(&v, number->u.fval)) return nullptr;
+    if (!f_is_zero(&v) && !f_is_inf(&v) && f_findexp(&v) < -126) return nullptr;
+    NODE* c = new_node(FCON, narrow);
+    c->u.fval = new simul_fval(v);
+    c->ls = number->ls;
+    return c;
 }
 
 } // namespace
@@ -203,21 +263,11 @@ NODE* simp_float_relop(NODE* t, struct LOOP* loop) {
     if (compare_without_signs(t)) return simp_node(t, loop);
     if (NODE* r = compare_as_integers(t, loop)) return r;
     NODE *l = t->left, *r = t->right;
-    auto widens = [](const NODE* n) {
-        return n->op == SCONV && n->type->is_float() && n->left->type->is_float() &&
-               n->left->type->size < n->type->size;
-    };
     if (!widens(l)) return t;
     TYPE* narrow = l->left->type->stqs();
     if (r->op == FCON && r->type->is_float()) {
-        simul_fval v = *r->u.fval;
-        fp_error = 0;
-        truncate_fval_to_target(&v, narrow);
-        if (fp_error || f_is_nan(&v) || !f_bit_eq(&v, r->u.fval)) return t;
-        if (!f_is_zero(&v) && !f_is_inf(&v) && f_findexp(&v) < -126) return t;
-        NODE* c = new_node(FCON, narrow);
-        c->u.fval = new simul_fval(v);
-        c->ls = r->ls;
+        NODE* c = short_constant(r, narrow);
+        if (!c) return t;
         erase_tree(r);
         t->right = c;
     } else if (widens(r) && is_float_operand(r->left, narrow)) {
@@ -264,4 +314,24 @@ NODE* simp_RECIP(NODE* t, struct LOOP* loop) {
     t->left = take_left(t->left);
     TYPE* type = t->type;
     return made(UMINUS, simp_node(t, loop), nullptr, type, loop);
+}
+
+// (float)((double)x op (double)y) of floats and short constants: the wider format has more than twice the digits, so
+// that its result is exact or rounds to what the short one gives.
+NODE* compute_in_short_format(NODE* t, struct LOOP* loop) {
+    NODE* inner = t->left;
+    TYPE *narrow = t->type->stqs(), *wide = inner->type;
+    if (!narrow->is_float() || !wide->is_float() || narrow->size != 32 || wide->size != 64) return nullptr;
+    const bool two = inner->op == PLUS || inner->op == MINUS || inner->op == MULT;
+    if (!two && inner->op != UMINUS && inner->op != ABS) return nullptr;
+    auto fits = [&](const NODE* n) { return widens(n) && n->type->size == wide->size && n->left->type->size == 32; };
+    if (!fits(inner->left)) return nullptr;
+    NODE* c = two && inner->right->op == FCON ? short_constant(inner->right, narrow) : nullptr;
+    if (two && !c && !fits(inner->right)) return nullptr;
+    inner->left = take_left(inner->left);
+    if (c) erase_tree(inner->right);
+    if (two) inner->right = c ? c : take_left(inner->right);
+    inner->type = narrow;
+    erase_node(t);
+    return simp_node(inner, loop);
 }

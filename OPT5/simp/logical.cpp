@@ -94,8 +94,8 @@ TEST test_of(NODE* t) {
     return test;
 }
 
-// The same of the value below a difference or a mask that makes the test one of an interval: (unsigned)x - low < n,
-// (x & ~m) == c with ones at the low end of m alone.
+// The same of the value below a difference, a cast or a mask that makes the test one of an interval: (unsigned)x - low
+// < n, (x & ~m) == c with ones at the low end of m alone.
 TEST test_of_inner_value(NODE* t) {
     TEST test = test_of(t);
     if (!test.value || test.low > test.high) return test;
@@ -107,12 +107,11 @@ TEST test_of_inner_value(NODE* t) {
         if ((m & (m + 1)) != 0 || (test.low.value & m) != 0 || m >= mask_of(type) >> 1) return test;
         test.high = test.low + INT65(0, m);
         test.value = inner->left;
-    } else if ((is_node_with_icon(inner, MINUS) || is_node_with_icon(inner, PLUS)) && !is_signed(type)) {
-        NODE* x = inner->left;
-        if (x->op == SCONV && is_integer(x->left->type) && x->left->type->size == type->size &&
-            !is_bitfield_access(x->left))
-            x = x->left;
-        const INT65 c = inner->right->u.lval, shift = inner->op == PLUS ? -c : c;
+    } else if ((is_node_with_icon(inner, MINUS) || is_node_with_icon(inner, PLUS) || is_equal_width_cast(inner)) &&
+               !is_signed(type)) {
+        NODE* x = inner->op == SCONV ? inner : inner->left;
+        if (is_equal_width_cast(x)) x = x->left;
+        const INT65 c = inner->op == SCONV ? INT65(0) : inner->right->u.lval, shift = inner->op == PLUS ? -c : c;
         const INT65 low = truncate_to_type(test.low + shift, x->type), high = low + (test.high - test.low);
         if (high > int_type_max(x->type)) return test;
         test = {x, low, high, test.inside};
@@ -259,6 +258,8 @@ NODE* join_tests_of_bits(NODE* t, struct LOOP* loop) {
     return coerce_to_type(result, made(opposite ? NEQ : EQ, masked, bits, tp->int_t, loop));
 }
 
+} // namespace
+
 NODE* join_tests_of_one_value(NODE* t, struct LOOP* loop) {
     const TEST a = test_of(t->left), b = test_of(t->right);
     if (test_one_value(a, b)) {
@@ -274,6 +275,8 @@ NODE* join_tests_of_one_value(NODE* t, struct LOOP* loop) {
             if (NODE* r = join_intervals(t, x, y, loop)) return r;
     return nullptr;
 }
+
+namespace {
 
 // ---- Forms without a branch
 // Whether an operator on bits may take both as they stand: two values of 0 or 1, and no trap.

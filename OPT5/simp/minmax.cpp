@@ -75,10 +75,19 @@ bool is_bound(const NODE* value, const NODE* bound, int op, bool on_the_right) {
 
 } // namespace
 
+// A compare that holds for equals says as much as the strict one where equal numbers are the same: of an ordinary
+// constant, which is no zero.
+static int strict_op(const NODE* c) {
+    if (c->op != FLE && c->op != FGE) return c->op;
+    for (const NODE* side : {c->left, c->right})
+        if (side->op == FCON && !f_is_zero(side->u.fval) && !f_is_nan(side->u.fval)) return c->op == FLE ? FLT : FGT;
+    return c->op;
+}
+
 NODE* make_minmax(const NODE* c, const NODE* a, const NODE* b, TYPE* type) {
     if (!c->left || !c->right || !equiv_mtypes(c->left->type, type) || !equiv_mtypes(c->right->type, type))
         return nullptr;
-    int op = c->op;
+    int op = strict_op(c);
     if (op == FGEN || op == FLEN) {
         op = boolean_inv[op];
         std::swap(a, b);
@@ -224,6 +233,23 @@ static NODE* clamp_of_QUEST(NODE* t, struct LOOP* loop) {
     return call;
 }
 
+// x < c ? c : fmin(x, d) with c <= d is fmax(fmin(x, d), c), and with the orders exchanged: a NaN and a zero of either
+// sign fail the compare with c on both sides, and stay what they are.
+static NODE* float_clamp_of_QUEST(const NODE* t, struct LOOP* loop) {
+    const NODE *c = t->left, *limit = t->right->left, *inner = t->right->right;
+    if (limit->op != FCON || inner->op != ICALL || !inner->left || inner->left->op != COMMA) return nullptr;
+    const int less = order_of(strict_op(c), t->type);
+    if (less < 0 || !equiv_mtypes(c->left->type, t->type) || !equiv_mtypes(limit->type, t->type)) return nullptr;
+    const bool maximum = less == 1; // of the outer call
+    const BIF* bif = extremum_BIF(!maximum, t->type);
+    const NODE *x = inner->left->left, *other = inner->left->right;
+    if (!bif || bif->name != inner->u.name || other->op != FCON || !trees_are_congruent(c->left, x, false) ||
+        !trees_are_congruent(c->right, limit, false))
+        return nullptr;
+    const simul_fval *low = maximum ? limit->u.fval : other->u.fval, *high = maximum ? other->u.fval : limit->u.fval;
+    return f_le(low, high) ? extremum_call(maximum, copy_tree(inner), copy_tree(limit), t->type, loop) : nullptr;
+}
+
 // Arms that were widened for the result, where the narrow values are compared: widened behind the choice. A new tree in
 // the narrow type, or null.
 static NODE* narrow_arm(const NODE* arm, TYPE* narrow) {
@@ -252,7 +278,9 @@ NODE* minmax_of_QUEST(NODE* t, struct LOOP* loop) {
         call = simp_node(call, loop);
     else
         call = minmax_of_widened(t, loop);
-    if (!call) return op_is_int_compare(c->op) ? clamp_of_QUEST(t, loop) : nullptr;
+    if (!call && op_is_int_compare(c->op)) return clamp_of_QUEST(t, loop);
+    if (!call) call = float_clamp_of_QUEST(t, loop);
+    if (!call) return nullptr;
     erase_tree(t);
     return call;
 }

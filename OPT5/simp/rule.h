@@ -61,6 +61,12 @@ inline bool is_bitfield_access(const NODE* t) {
     return (t->op == STDOT || t->op == STREF) && t->right && t->right->mval && t->right->mval->is_bitfld;
 }
 
+// A cast between the signed and the unsigned type of one width: the bits stay.
+inline bool is_equal_width_cast(const NODE* t) {
+    return t->op == SCONV && is_integer(t->type) && is_integer(t->left->type) && t->type->size == t->left->type->size &&
+           !is_bitfield_access(t->left);
+}
+
 // ---- Effects. Looks at a bounded number of nodes, so that asking at every node stays linear: a tree too large to be
 // looked through counts as impure.
 bool is_pure(const NODE* t);

@@ -241,6 +241,52 @@ NODE* common_cast_outward(NODE* t, struct LOOP* loop) {
     return simp_node(b, loop);
 }
 
+// What is computed of the operand that both arms have, in either order where the operator has none.
+bool shares_operand(const NODE* a, const NODE* b, bool a_right, bool b_right) {
+    const NODE *x = a_right ? a->right : a->left, *y = a_right ? a->left : a->right;
+    const NODE *z = b_right ? b->right : b->left, *w = b_right ? b->left : b->right;
+    const bool commutes = a->op != MINUS && a->op != SLL && a->op != SRL;
+    return (commutes || a_right == b_right) && same_value(x, z) && same_integers(x->type, z->type) &&
+           same_integers(y->type, w->type);
+}
+
+// c ? x + y : x + z is x + (c ? y : z): either gives the number that the arm gave.
+NODE* common_operand_outward(NODE* t, struct LOOP* loop) {
+    NODE *a = then_arm(t), *b = else_arm(t);
+    if (a->op != b->op || !is_integer(t->type) || !same_integers(a->type, t->type) || !same_integers(b->type, t->type))
+        return nullptr;
+    switch (a->op) {
+    case PLUS:
+    case MINUS:
+    case MULT:
+    case ANDB:
+    case ORB:
+    case XORB:
+        if (!operands_have_type(a) || !operands_have_type(b)) return nullptr;
+        break;
+    case SLL:
+    case SRL:
+        if (!operand_has_type(a) || !operand_has_type(b)) return nullptr;
+        break;
+    default: return nullptr;
+    }
+    for (int side = 0; side < 4; ++side) {
+        const bool a_right = (side & 1) != 0, b_right = (side & 2) != 0;
+        if (!shares_operand(a, b, a_right, b_right)) continue;
+        if (!is_pure(t->left) || !is_pure(a) || !is_pure(b)) return nullptr;
+        NODE *&y = a_right ? a->left : a->right, *w = b_right ? b->left : b->right;
+        NODE* common = b_right ? b->right : b->left;
+        erase_node(b);
+        erase_tree(common);
+        then_arm(t) = y;
+        else_arm(t) = w;
+        t->type = t->right->type = w->type->stqs();
+        y = simp_node(t, loop);
+        return simp_node(a, loop);
+    }
+    return nullptr;
+}
+
 // x < 0 ? -x : x, and its other forms
 NODE* absolute_value(NODE* t, struct LOOP* loop) {
     NODE* c = t->left;
@@ -301,7 +347,8 @@ const RULE select_rules[] = {constant_condition,
                              by_pattern,
                              minmax_of_QUEST,
                              ordered_arms,
-                             common_cast_outward};
+                             common_cast_outward,
+                             common_operand_outward};
 
 // The arm under the operator of `t`, whose other operand, if there is one, is a constant; null where that is no
 // constant.

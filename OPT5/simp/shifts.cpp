@@ -7,6 +7,7 @@
 #include "OPT5/simp/patterns.h"
 #include "OPT5/simp/rule.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
 
 using namespace rules;
 
@@ -42,6 +43,13 @@ TYPE* signed_type_of(uint64_t bits) {
     return nullptr;
 }
 
+// Whether x << n is the number.
+bool shift_loses_nothing(const NODE* x, int n, struct LOOP* loop) {
+    INT65 min, max;
+    return calculate_bounds(x, loop, &min, &max) && min >= int_type_min(x->type) >> INT65(n) &&
+           max <= int_type_max(x->type) >> INT65(n);
+}
+
 // (x << n) >> n keeps the low bits: a mask, or for a signed x their extension. (x >> n) << n clears the low bits.
 NODE* shift_there_and_back(NODE* t, struct LOOP* loop) {
     NODE* inner = t->left;
@@ -53,6 +61,11 @@ NODE* shift_there_and_back(NODE* t, struct LOOP* loop) {
     uint64_t kept = (mask >> n) << n & mask;
     if (t->op == SRL) {
         if (is_signed(type)) {
+            if (shift_loses_nothing(inner->left, n, loop)) {
+                erase_node(t->right);
+                erase_node(inner->right);
+                return coerce_to_type(type, take_left(take_left(t)));
+            }
             TYPE* narrow = signed_type_of(type->size - static_cast<unsigned>(n));
             if (!narrow) return nullptr;
             erase_node(t->right);
@@ -88,6 +101,16 @@ NODE* shift_under_cast(NODE* t, struct LOOP* loop) {
     return coerce_to_type(type, simp_node(cast, loop));
 }
 
+// (T)x << n of an x of the same width
+NODE* cast_outward(NODE* t, struct LOOP* loop) {
+    NODE* cast = t->left;
+    if (t->op != SLL || !is_equal_width_cast(cast)) return nullptr;
+    TYPE* type = t->type;
+    cast->left = made(SLL, cast->left, t->right, cast->left->type->stqs(), loop);
+    erase_node(t);
+    return coerce_to_type(type, simp_node(cast, loop));
+}
+
 // (x * c) << n
 NODE* shift_product(NODE* t, struct LOOP* loop) {
     const int n = shift_count_of(t);
@@ -105,8 +128,8 @@ NODE* narrow_operand(NODE* t, struct LOOP* loop) {
     return narrow_to_mask(&t->left, t->op == SLL ? mask >> n : mask << n & mask) ? simp_node(t, loop) : nullptr;
 }
 
-const RULE shift_rules[] = {shift_by_nothing, join_shifts, shift_there_and_back, shift_under_cast, shift_product,
-                            narrow_operand,   by_pattern};
+const RULE shift_rules[] = {shift_by_nothing, join_shifts,   shift_there_and_back, shift_under_cast,
+                            cast_outward,     shift_product, narrow_operand,       by_pattern};
 
 } // namespace
 

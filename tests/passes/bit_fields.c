@@ -36,7 +36,7 @@ int reads(struct flags *p) { return p->d + p->b + p->e; }
 
 // Neighbouring stores to one container are one.
 // FUNCTION: writes
-// HAS: *(unsigned int *)p = (unsigned int)v << 3 | 5
+// HAS: *(unsigned int *)p = (unsigned int)(v << 3 | 5)
 // HAS: *((unsigned int *)p + 1) = *((unsigned int *)p + 1) & 511 | 1024
 // NOT: p
 void writes(struct flags *p, int v) {
@@ -121,7 +121,7 @@ struct mode {
 // FUNCTION: worked
 // COUNT 0: class 1,
 // COUNT 0: /\*[^=]*[-+|&]= /
-// HAS: $O$B0 = (unsigned int)((int)$O$B0 + 3) & 7
+// HAS: $O$B0 = (unsigned int)((int)$O$B0 + 3 & 7)
 long worked(struct mode *p, int n) {
     struct mode m = *p;
     for (int i = 0; i < n; i++) {

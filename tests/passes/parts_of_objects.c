@@ -144,7 +144,8 @@ void read_by_the_store(struct pair* p, int* q, int i, int x) {
 }
 
 // FUNCTION: covered_in_part
-// COUNT 4: * 17
+// COUNT 3: * 17
+// COUNT 1: * 544
 void covered_in_part(struct outer* p, struct outer* o, int* q, int i, int x) {
     q[2 * i] = x * 17;
     q[i] = x;

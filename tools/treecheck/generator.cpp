@@ -26,6 +26,7 @@ bool computes(const TYPE* t) { // operators compute in this type: what is narrow
 
 NODE* binary(int op, NODE* a, NODE* b, TYPE* type) { return maketree(op, a, b, type); }
 NODE* unary(int op, NODE* a, TYPE* type) { return maketree(op, a, nullptr, type); }
+NODE* number_of(TYPE* type, unsigned v) { return mk_ICON(INT65(v), type); }
 NODE* address_of(NODE* object) {
     TYPE* t = object->type;
     return unary(UAND, object, tp->mk_ptr(t->is_array() ? t->elem_type() : t));
@@ -309,13 +310,33 @@ NODE* GENERATOR::lane(TYPE* type, int depth) {
                   type);
 }
 
+// x < c ? c : x > d ? d : x and the like, of floats.
+NODE* GENERATOR::clamp(TYPE* type, int depth) {
+    NODE *x = operand(type, depth), *value = x;
+    for (int i = 0; i < 2; ++i) {
+        static const int ops[] = {FLT, FLE, FGT, FGE};
+        NODE* limit = constant(type);
+        NODE* test = binary(ops[random.pick(4)], copy_tree(x), copy_tree(limit), tp->int_t);
+        value = binary(QUEST, test, binary(COLON, limit, value, type), type);
+    }
+    return value;
+}
+
 NODE* GENERATOR::choice(TYPE* type, int depth) {
     if (random.one_in(4))
         if (NODE* t = extremum(type, depth)) return t;
     if (!type->is_pointer() && (type->is_float() || computes(type)) && random.one_in(2))
         return choice_by_value(type, depth);
+    if (type->is_float() && random.one_in(3)) return clamp(type, depth);
     NODE* a = operand(type, depth);
     NODE* b = random.one_in(4) ? copy_tree(a) : operand(type, depth);
+    if (computes(type) && random.one_in(4)) { // arms that share an operand
+        static const int ops[] = {PLUS, MINUS, MULT, ANDB, ORB, XORB};
+        const int op = ops[random.pick(6)];
+        NODE* common = leaf(type);
+        a = random.pick(2) ? binary(op, a, copy_tree(common), type) : binary(op, copy_tree(common), a, type);
+        b = random.pick(2) ? binary(op, b, common, type) : binary(op, common, b, type);
+    }
     if (random.one_in(6)) { // both arms are computed
         NODE* args = binary(COMMA, binary(COMMA, truth(depth - 1), a, tp->int_t), b, tp->int_t);
         return mk_ICALL("quest$colon", args, type);
@@ -329,10 +350,57 @@ NODE* GENERATOR::condition(int depth) {
     return truth(depth);
 }
 
+// Two pointers moved by the same offset, or whose difference is compared.
+NODE* GENERATOR::meeting_pointers(int depth) {
+    TYPE* p = tp->mk_ptr(tp->int_t);
+    NODE *a = pointer(p, depth - 1), *b = pointer(p, depth - 1);
+    const int op = random.pick(2) ? EQ : NEQ;
+    if (random.one_in(3)) return binary(op, binary(MINUS, a, b, tp->long_t), number_of(tp->long_t, 0), tp->int_t);
+    NODE* i = operand(random.pick(2) ? tp->int_t : tp->long_t, depth - 1);
+    NODE* moved = binary(PLUS, a, copy_tree(i), p);
+    return binary(op, moved, binary(PLUS, b, random.one_in(6) ? constant(tp->int_t) : copy_tree(i), p), tp->int_t);
+}
+
+// An integer as a float beside a number that lies at or between integers, or beside another one.
+NODE* GENERATOR::converted_comparison(int depth) {
+    TYPE *type = random.pick(2) ? tp->float_t : tp->double_t, *from = random.of(w.integer_types);
+    NODE *a = cast_to(type, operand(from, depth)), *b;
+    if (random.one_in(3)) {
+        b = cast_to(type, operand(random.of(w.integer_types), depth));
+    } else {
+        b = cast_to(type, number_of(tp->long_t, 0));
+        b->left->u.lval = number(random.one_in(3) ? tp->long_t : tp->int_t);
+        NODE* half = binary(DIV, b, cast_to(type, number_of(tp->int_t, random.pick(2) + 1)), type);
+        b = random.one_in(2) ? half : binary(MINUS, half, constant(type), type);
+    }
+    if (random.one_in(4)) std::swap(a, b);
+    return binary(FEQ + static_cast<int>(random.pick(14)), a, b, tp->int_t);
+}
+
+// Two compares of one value, or of one pair of values, under an operator on bits.
+NODE* GENERATOR::joined_comparisons(TYPE* type, int depth) {
+    NODE *a = leaf(type), *b = random.one_in(2) ? nullptr : leaf(type);
+    auto compare = [&] {
+        int op = EQ + static_cast<int>(random.pick(6));
+        if (op >= LE && type->is_unsigned()) op += ULE - LE;
+        NODE *x = copy_tree(a), *y = b ? copy_tree(b) : constant(type);
+        if (b && random.one_in(2)) std::swap(x, y);
+        return binary(op, x, y, tp->int_t);
+    };
+    static const int ops[] = {ANDB, ORB, ANDAND, OROR};
+    NODE* first = compare();
+    NODE* t = binary(ops[random.pick(4)], first, random.one_in(6) ? truth(depth - 1) : compare(), tp->int_t);
+    erase_tree(a);
+    erase_tree(b);
+    return t;
+}
+
 NODE* GENERATOR::comparison(int depth) {
+    if (options.floats && random.one_in(12)) return converted_comparison(depth);
     if (options.pointers && random.one_in(10)) {
         TYPE* p = tp->mk_ptr(tp->int_t);
         static const int ops[] = {EQ, NEQ, ULE, ULT, UGE, UGT};
+        if (random.one_in(3)) return meeting_pointers(depth);
         return binary(ops[random.pick(6)], pointer(p, depth - 1),
                       random.one_in(4) ? unary(PCONV, constant(tp->ulong_t), p) : pointer(p, depth - 1), tp->int_t);
     }
@@ -354,6 +422,11 @@ NODE* GENERATOR::truth(int depth) {
     case 0: return binary(ANDAND, condition(depth - 1), condition(depth - 1), tp->int_t);
     case 1: return binary(OROR, condition(depth - 1), condition(depth - 1), tp->int_t);
     case 2: return unary(EXCLAIM, condition(depth - 1), tp->int_t);
+    case 3: {
+        static TYPE* const types[] = {tp->int_t, tp->uint_t, tp->long_t, tp->ullong_t};
+        if (random.pick(2)) return joined_comparisons(types[random.pick(4)], depth);
+        [[fallthrough]];
+    }
     default: return comparison(depth);
     }
 }
@@ -434,6 +507,10 @@ NODE* GENERATOR::floating(TYPE* type, int depth) {
     }
     NODE* b = random.one_in(2) ? constant(type) : random.one_in(8) ? copy_tree(a) : operand(type, depth);
     if (random.one_in(6)) std::swap(a, b);
+    if (type == tp->float_t && random.one_in(6)) { // computed in the wider format
+        TYPE* wide = tp->double_t;
+        return cast_to(type, binary(ops[random.pick(4)], cast_to(wide, a), cast_to(wide, b), wide));
+    }
     return binary(ops[random.pick(4)], a, b, type);
 }
 

@@ -65,6 +65,10 @@ private:
     NODE* integer_operator(TYPE* type, int depth);
     NODE* truth(int depth);
     NODE* comparison(int depth);
+    NODE* meeting_pointers(int depth);
+    NODE* converted_comparison(int depth);
+    NODE* joined_comparisons(TYPE* type, int depth);
+    NODE* clamp(TYPE* type, int depth);
     NODE* condition(int depth);
     NODE* floating(TYPE* type, int depth);
     NODE* pointer(TYPE* type, int depth);

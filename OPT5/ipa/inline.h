@@ -8,7 +8,11 @@ void create_inliner();
 void init_proc_integration();
 
 void auto_inline_call_sites();
+// Expands what `auto_inline_call_sites` chose in the current function; a call of a saved body that is not expanded brings
+// the definition back.
 void integrate_calls_in_function();
+// Whether expansion through expansion stops at a depth.
+bool inline_recursion_is_limited();
 
 // The list of positions whose function was integrated elsewhere, to the debug stream.
 void dump_psnrefs();

@@ -207,7 +207,8 @@ private:
     }
 
     void call(NODE* t, bool value_unused) {
-        ++f->unique_call_index;
+        delete t->call;
+        t->call = new CALL_RECORD{f, f->unique_call_index++, 0};
         FUNINFO* callee = nullptr;
         if (t->left->op == UAND && t->left->left->op == NAME && t->left->left->u.sym->is_function()) {
             callee = make_FUNINFO(t->left->left->u.sym);

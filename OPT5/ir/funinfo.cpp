@@ -316,10 +316,6 @@ void erase_all() {
     erase_ptrs(f);
     delete f->ls_root;
     f->ls_root = nullptr;
-    for (BITVEC** sites : {&f->inline_sites, &f->forced_sites, &f->deep_sites}) {
-        delete *sites;
-        *sites = nullptr;
-    }
 }
 
 bool sym_appears_in_EHT(const SYMTAB* sym) {

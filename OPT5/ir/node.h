@@ -21,6 +21,7 @@ class SSAVAR;
 struct LIST;
 struct LS;
 class BBLK;
+class FUNINFO;
 
 constexpr uint32_t NO_PROFILE = 0xFFFFFFFF;
 
@@ -47,6 +48,13 @@ struct RARE_FIELDS {
     intptr_t branch_hint = 0; // LABELREF: below zero unlikely, above zero likely
     NODE* ssa_args = nullptr; // SSA_PHI
     DDNODE_RECORD* dd = nullptr; // of the node, not of its copies
+};
+
+// Where a call of the source stands. A copy keeps what the call was copied from.
+struct CALL_RECORD {
+    FUNINFO* caller;       // the function that the call was read in
+    uint32_t id;           // of the call in that function, from 0: the index of its bit in the sets of call sites
+    uint16_t inline_depth; // how many expansions it came through
 };
 
 class NODE final : public BASE_NODE {
@@ -77,6 +85,7 @@ public:
         LBL* lbl;       // LABELREF, LABELDEF
         char* text;     // SCON bytes, ASM text, FCON print form, NAME alternative name; owned
         PRAGMA* pragma; // PPRAGMA, owned
+        CALL_RECORD* call; // CALL, UCALL; owned, null until the call sites are numbered
         NODE* reach;    // SSA_USE; metavalue slot of SSA definitions
     };
     LS* ls = nullptr; // source scope, null for none

@@ -128,6 +128,18 @@ bool LS::object_may_be_live_in_scope(const SYMTAB* sym, const LS* scope) {
     return sym->scope->encloses(scope);
 }
 
+static void set_depth(LS* scope, uint32_t depth) {
+    scope->depth = depth;
+    for (LS* child = scope->first_child; child; child = child->next_sibling) set_depth(child, depth + 1);
+}
+
+void LS::splice_scope(LS* tree) {
+    tree->parent = this;
+    (last_child ? last_child->next_sibling : first_child) = tree;
+    last_child = tree;
+    set_depth(tree, depth + 1);
+}
+
 void LS::validate() const {
     for (const LS* child = first_child; child; child = child->next_sibling) {
         OPT_ASSERT(child->parent == this && child->depth == depth + 1);

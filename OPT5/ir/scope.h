@@ -77,6 +77,8 @@ struct LS {
     static bool object_may_be_live_in_scope(const SYMTAB* sym, const LS* scope);
     // Joins the pointers of the current function that are derived from each other under one `root`.
     static void build_PTR_equivalence_groups();
+    // Hooks a scope tree that has no parent behind the last child of this one, which owns it then.
+    void splice_scope(LS* tree);
     void validate() const;
     void print(FILE* out, int indent = 0) const;
 };

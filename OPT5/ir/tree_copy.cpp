@@ -36,6 +36,10 @@ static void own_payload(NODE* c) {
         c->pragma = new PRAGMA(*c->pragma);
         c->pragma->next = nullptr;
         break;
+    case CALL:
+    case UCALL:
+        if (c->call) c->call = new CALL_RECORD(*c->call);
+        break;
     case LABELREF:
         if (c->lbl) ++c->lbl->refcount;
         break;
@@ -144,6 +148,8 @@ static void drop_payload(NODE* t) {
     case MCALL:
     case UMCALL: free(t->u.name); break;
     case PPRAGMA: delete t->pragma; break;
+    case CALL:
+    case UCALL: delete t->call; break;
     }
     const RARE_FIELDS& rare = t->rare();
     if (rare.dd && rare.dd->node == t) {

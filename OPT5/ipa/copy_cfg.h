@@ -1,0 +1,26 @@
+// Copies of the bodies of functions, for call integration.
+#pragma once
+
+#include <unordered_map>
+#include <vector>
+
+class BBLK;
+class FUNINFO;
+class SYMTAB;
+struct LS;
+
+// A body that was copied into a function, and is not yet part of its graph.
+struct CFG_COPY {
+    BBLK* first = nullptr; // the entry; the others follow by `dflink`, `rdflink` and `uolink`
+    BBLK* last = nullptr;
+    std::vector<SYMTAB*> symbols; // all of the copied locals and parameters, on no list yet
+    LS* ls_root = nullptr;        // owned by whoever puts it in its place
+    std::unordered_map<const SYMTAB*, SYMTAB*> symbol_of; // of the original; looked up
+};
+
+// Copies blocks, edges, statements, locals and scopes of `body`, which may be a saved body, into `owner`. Every label is
+// new. The copies of symbols lose `const`: what was set once for the function is set at each expansion.
+CFG_COPY copy_cfg(const FUNINFO& body, FUNINFO* owner);
+
+// Keeps a copy of the body as FUNINFO::saved_cfg, unless there is one.
+void save_cfg(FUNINFO* f);

@@ -27,8 +27,6 @@ register_option pass_debug_inline_auto_limit("debug:inline_auto_limit");
 register_option pass_debug_inline_benefit_call("debug:inline_benefit_call");
 register_option pass_debug_inline_benefit_fold("debug:inline_benefit_fold");
 register_option pass_debug_inline_benefit_pressure("debug:inline_benefit_pressure");
-register_option pass_debug_inline_commentary("debug:inline_commentary");
-register_option pass_debug_inline_n("debug:inline_n");
 register_option pass_debug_inline_pressure_limit("debug:inline_pressure_limit");
 register_option pass_debug_inline_restrict("debug:inline_restrict");
 register_option pass_debug_inline_small_limit("debug:inline_small_limit");

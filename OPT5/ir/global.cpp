@@ -31,7 +31,7 @@ int alias_vars_option, inline_single, cache_sys_funinfo = 2, code_is_reentrant =
     unsigned_ok_for_RPTB, volit_vars, strict_fp = 1, use_g2, inhibit_clustering, remove_hooks_when_inlining,
     default_o3_auto_inline = 20;
 char aux_cmd_flag[10];
-int no_outside_callers, no_outside_writers, inline_blocks_limit;
+int no_outside_callers, no_outside_writers, inline_blocks_limit = 700, inline_loops_limit = 500;
 int rtc_rpt_threshold;
 bool rtc_unified_memory, rtc_RPT_ok_for_loop;
 int cpu_version = -1;

@@ -57,7 +57,7 @@ extern int alias_vars_option, inline_single, cache_sys_funinfo, code_is_reentran
     apply_symbolic_methods, pass_args_in_regs, program_mode, source_interlist, unsigned_index_wraps, unsigned_ok_for_RPTB,
     volit_vars, strict_fp, use_g2, inhibit_clustering, remove_hooks_when_inlining, default_o3_auto_inline;
 extern char aux_cmd_flag[10];
-extern int no_outside_callers, no_outside_writers, inline_blocks_limit;
+extern int no_outside_callers, no_outside_writers, inline_blocks_limit, inline_loops_limit;
 extern int rtc_rpt_threshold;
 extern bool rtc_unified_memory, rtc_RPT_ok_for_loop;
 extern int cpu_version; // silicon version, -1 until known

@@ -164,7 +164,7 @@ NODE* unaligned_rest(const NODE* p, INT65 alignment) {
     }
 }
 
-NODE* simp_ALIGNED_ICALL(NODE* t, struct LOOP* loop) {
+NODE* simp_ALIGNED_ICALL(NODE* t, struct LOOP*) {
     if (arguments(t) != 1 || !t->type->is_pointer()) return t;
     TYPE* type = true_pointer_type(t->type);
     NODE* p = take_left(t);
@@ -180,7 +180,6 @@ NODE* simp_ALIGNED_ICALL(NODE* t, struct LOOP* loop) {
     }
     NODE* cast = push_down_pointer_cast(type, p);
     return fact ? mk_COMMAOP(fact, cast) : cast;
-    (void)loop;
 }
 
 struct CALLBACKS {

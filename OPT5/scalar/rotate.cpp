@@ -140,12 +140,12 @@ private:
 
 constexpr int MAX_TEST_NODES = 12;
 
-// The test of a loop on top of it, if it is all of its block and cheap enough to stand twice.
+// The test of a loop on top of it, if it is cheap enough to stand twice with the few statements in front of it.
 const NODE* test_on_top(const BBLK* head) {
-    const LIST* test = head->statements;
-    if (!test || test->rest || test->first->op != IF || head->is_in_LIR_form()) return nullptr;
-    if (test->first->left->op == ENDLOOP || count_nodes_in_tree(test->first->left) > MAX_TEST_NODES) return nullptr;
-    return test->first;
+    const NODE* test = head->branch();
+    if (!test || test->op != IF || head->is_in_LIR_form() || nodes_of_tail(head) < 0) return nullptr;
+    if (test->left->op == ENDLOOP || count_nodes_in_tree(test->left) > MAX_TEST_NODES) return nullptr;
+    return test;
 }
 
 bool ends_in_jump_to(const BBLK* bb, const BBLK* target) {
@@ -203,14 +203,6 @@ BBLK* body_behind_test(const NATURAL_LOOPS& loops, const NATURAL_LOOP* loop, con
     return loops.contains(loop, left) ? left : right;
 }
 
-void take_copy(BBLK* bb, BBLK* head, const NODE* test) {
-    LIST* last = bb->last_statement();
-    disconnect(bb, head);
-    erase_tree(last->first);
-    last->first = copy_tree(test);
-    fixup_edge_lists(bb, last->first);
-}
-
 // A copy of the test takes the jump's place: one conditional branch in each iteration instead of a test and a jump.
 // True if a test is reached no more.
 bool close_loops_by_tests() {
@@ -223,10 +215,12 @@ bool close_loops_by_tests() {
         if (!test || head == currfuninfo->bb_list) continue;
         TEST_TAKERS takers;
         if (!find_takers(loops, head, &takers)) continue;
+        // Where no promise keeps it in its place, the layout closes a loop whose test does not stand alone.
+        if (head->statements->rest && !takers.promising) continue;
         if (takers.promising && !put_behind_promise(takers.promising, body_behind_test(loops, loop.get(), test)))
             continue;
-        if (takers.ahead) take_copy(takers.ahead, loop->header, test);
-        for (BBLK* bb : takers.back) take_copy(bb, loop->header, test);
+        if (takers.ahead) take_copy_of_tail(takers.ahead, loop->header);
+        for (BBLK* bb : takers.back) take_copy_of_tail(bb, loop->header);
         unreached |= !head->predecessors;
     }
     return unreached;

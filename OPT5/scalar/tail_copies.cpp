@@ -72,6 +72,18 @@ LIST* copy_of_tail(const BBLK* bb, NODE* control) {
     return tail;
 }
 
+void take_copy_of_tail(BBLK* bb, BBLK* tail) {
+    NODE* control = copy_tree(tail->branch());
+    LIST* copy = copy_of_tail(tail, control);
+    LIST* jump = bb->last_statement();
+    disconnect(bb, tail);
+    erase_tree(jump->first);
+    *jump = *copy;
+    delete copy;
+    set_statements(bb, bb->statements); // they have another end
+    fixup_edge_lists(bb, control);
+}
+
 namespace {
 
 constexpr double SELDOM = 0.5; // runs of a jump that is let stand
@@ -94,7 +106,7 @@ public:
         for (const CANDIDATE& c : all) {
             if (c.nodes > growth_left) continue;
             growth_left -= c.nodes;
-            take_copy(c.from, c.tail);
+            take_copy_of_tail(c.from, c.tail);
             changed = true;
         }
         return changed;
@@ -140,18 +152,6 @@ private:
         for (auto bb = from.begin() + 1; bb != from.end(); ++bb)
             if (frequencies.of(*bb) >= SELDOM && !ends_in_promise(*bb))
                 all->push_back({*bb, tail, nodes, frequencies.of(*bb) * gain});
-    }
-
-    static void take_copy(BBLK* bb, BBLK* tail) {
-        NODE* control = copy_tree(tail->branch());
-        LIST* copy = copy_of_tail(tail, control);
-        LIST* jump = bb->last_statement();
-        disconnect(bb, tail);
-        erase_tree(jump->first);
-        *jump = *copy;
-        delete copy;
-        set_statements(bb, bb->statements); // they have another end
-        fixup_edge_lists(bb, control);
     }
 
     const FREQUENCIES frequencies;

@@ -11,6 +11,8 @@ int nodes_of_tail(const BBLK* bb);
 int growth_by_copies();
 // Those statements, and `control` behind them, for a block to own.
 LIST* copy_of_tail(const BBLK* bb, NODE* control);
+// A copy of all of `tail` takes the place of the jump to it at the end of `bb`.
+void take_copy_of_tail(BBLK* bb, BBLK* tail);
 
 // Jumps to small blocks that end in a test or a return become copies of them. Whether there were any; blocks are to be
 // numbered then.

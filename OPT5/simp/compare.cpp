@@ -5,6 +5,8 @@
 // that value or its opposite; an unsigned compare with 0 or 1 is an equality.
 
 #include "OPT5/simp/compare.h"
+
+#include "OPT5/ir/symbol_maps.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/linear_value.h"
@@ -434,11 +436,31 @@ NODE* compare_bases(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
+// A place in an object or just behind it, by its offset.
+bool is_place(const NODE* pointer, struct LOOP* loop, const NODE** address, int64_t* offset) {
+    const LINEAR_VALUE value(pointer, loop);
+    const LINEAR_FORM& sum = value.sum();
+    if (!value.is_known() || sum.term_count() != 1 || sum.begin()->coefficient != 1) return false;
+    *address = sum.begin()->tree;
+    *offset = sum.constant;
+    if ((*address)->op != UAND || (*address)->left->op != NAME) return false;
+    return *offset >= 0 && INT65(*offset) <= size_in_units((*address)->left->u.sym);
+}
+
+// The places of one object are in the order of their offsets: it does not lie around the end of memory.
+NODE* compare_places(NODE* t, struct LOOP* loop) {
+    const NODE *a, *b;
+    int64_t i, j;
+    if (!is_unsigned_relop(t->op) || !is_place(t->left, loop, &a, &i) || !is_place(t->right, loop, &b, &j)) return t;
+    if (!trees_are_congruent(a, b, false)) return t;
+    return decided(t, i == j ? holds_for_equals(t->op) : (i < j) == (t->op == ULT || t->op == ULE));
+}
+
 NODE* compare_pointers(NODE* t, struct LOOP* loop) {
     NODE *l = t->left, *r = t->right;
     if (same_value(l, r)) return decided(t, holds_for_equals(t->op));
     if (addresses_are_same(l, r)) return decided(t, holds_for_equals(t->op));
-    if (!is_equality(t)) return t;
+    if (!is_equality(t)) return compare_places(t, loop);
     if (is_null(r) && pointer_contains_adcon_term(l)) return decided(t, t->op == NEQ);
     if (l->type->size == r->type->size) {
         LINEAR_VALUE difference(l, loop);

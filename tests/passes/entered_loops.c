@@ -27,6 +27,24 @@ int between(const int *from) {
     return s;
 }
 
+// Places of one object are in order; of a pointer that is not known it is not known either.
+// FUNCTION: in_object
+// COUNT 0: /^(if .*goto L[^1]|goto)/
+// COUNT 1: goto L1
+int in_object(void) {
+    int s = 0;
+    for (const int *p = g + 3; p < g + 20; p++) s = s * 3 + *p;
+    return s;
+}
+
+// FUNCTION: not_in_object
+// COUNT 2: /from \+ 8/
+int not_in_object(const int *from) {
+    int s = 0;
+    for (const int *p = from + 3; p < from + 8; p++) s = s * 3 + *p;
+    return s;
+}
+
 // The condition that chooses the limit is the first test, and then the limit needs no choice; unless it is read behind
 // the loop, or its other value does not end the loop.
 // FUNCTION: chosen
@@ -137,7 +155,7 @@ int main(void) {
     int p[8] = {0};
     counted();
     unknown();
-    put_i16(between(g));
+    put_i16(between(g) + in_object() + not_in_object(g));
     put_i16(stepped(1));
     put_i32(promised(4, p));
     for (int i = 0; i < 5; i++) {

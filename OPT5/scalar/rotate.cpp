@@ -245,7 +245,10 @@ void rotate_loops() {
     if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
         if (close_loops_by_tests()) rebuildcfg();
         skip_decided_entry_tests();
-        if (opt_level() >= 2 && size_speed_goal() >= SPEED_MATTERS && duplicate_tails()) renumber_bblocks();
+        if (opt_level() >= 2 && size_speed_goal() >= SPEED_MATTERS && duplicate_tails()) {
+            renumber_bblocks();
+            skip_decided_entry_tests();
+        }
         lay_out_blocks();
     }
 }

@@ -94,6 +94,8 @@ public:
     uint16_t bitnum_m = NOT_A_CANDIDATE; // the bit of a candidate while `fact::live_variables` is known
     bool is_aliased_m = false;
     bool is_temp = false;
+    bool is_loop_limit = false; // assigned once, one of two values by a condition; with the second a loop does not run,
+                                // and where the first is chosen they differ
     bool dynamic_init = false;         // initialized at run time
     bool fl_static_candidate = false;  // a function-local static that may become automatic
     bool fl_static_eligible = false;

@@ -266,12 +266,23 @@ private:
                                {with_value(copy_tree(tested), limit, values->left),
                                 with_value(copy_tree(tested), limit, values->right), copy_tree(choice->left)});
         const auto otherwise = constant_truth(known.trees[1]);
-        if (!otherwise || pred_implies(known.trees[2], known.trees[0]) != !*otherwise) return;
+        if (!otherwise) return;
+        if (!differs_if_chosen(tested, limit, *otherwise) &&
+            pred_implies(known.trees[2], known.trees[0]) != !*otherwise)
+            return;
         if (is_changed_before(choice->left, tail, condition.at) || is_live_into(limit, target_of(test, *otherwise)))
             return;
         test->left = erased_for(test->left, *otherwise ? mk_EXCLAIM(copy_tree(choice->left)) : copy_tree(choice->left));
         cell->first->right = erased_for(choice, coerce_to_type(limit->type->stqs(), copy_tree(values->left)));
         outcomes.refresh(bb);
+    }
+
+    // The test asks whether a variable that has the limit's second value is the limit.
+    static bool differs_if_chosen(const NODE* tested, const SYMTAB* limit, bool if_second) {
+        if (!limit->is_loop_limit || (tested->op != EQ && tested->op != NEQ) || if_second != (tested->op == EQ))
+            return false;
+        return (tested->left->op == NAME && tested->left->u.sym == limit) ||
+               (tested->right->op == NAME && tested->right->u.sym == limit);
     }
 
     static NODE* erased_for(NODE* old, NODE* replacement) {

@@ -501,7 +501,9 @@ void MERGE::map_test(const LOOP_TEST& test) {
     const GROUP& g = *carrier(test);
     NODE* compare = test.branch->left;
     NODE* end = last_address(test, g);
+    const bool is_chosen = end->op == QUEST;
     SYMTAB* limit = make_pointer(g.type, g.address, end);
+    limit->is_loop_limit = is_chosen;
     const int op = test.stays_if_true ? NEQ : EQ;
     test.branch->left = maketree(op, mk_NAME(g.sym), mk_NAME(limit), tp->int_t, compare->ls);
     if (print_debug) {

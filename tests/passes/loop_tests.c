@@ -6,6 +6,8 @@
 int g[8];
 
 // FUNCTION: nested
+// COUNT 0: ?
+// COUNT 1: if (!(i > 0)) goto L3
 // HAS: /^if .* goto L4/
 // HAS: /^if .* goto L3/
 // HAS: L2:

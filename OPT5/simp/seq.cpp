@@ -278,7 +278,10 @@ void seq_trees(NODE* (*prepare)(NODE*)) {
         PSN* psn = cell->psn;
         delete cell;
         LIST* before = out;
-        if (prepare) t = prepare(t);
+        if (prepare) {
+            t = prepare(t);
+            replace_library_calls(&t);
+        }
         sequence_tree(t, &out, psn, !prepare);
         if (out == before) continue;
         if (is_call_that_never_returns(out->first))

@@ -16,6 +16,10 @@ void sequence_tree(NODE* tree, LIST** list, struct PSN* psn, bool simplified = f
 // Sequences what comes before the value of `tree` behind the statements of `*list`; the rest of the tree.
 NODE* promote_tree(NODE* tree, LIST** list, struct PSN* psn);
 
+// Puts operators, numbers and assignments in place of calls of the standard library and of characters of literals, in a
+// raw tree, before it is known which calls the function has.
+void replace_library_calls(NODE** link);
+
 // ---- Structures
 NODE* apply_UAND_to_struct(NODE* tree); // the address of a structure's value; consumes the tree
 // Whether a statement copies a constant object of a small structure of plain members, and its assignments one by one.

@@ -244,10 +244,10 @@ void rotate_loops() {
     constexpr int SIZE_MATTERS_MOST = 1, SPEED_MATTERS = 3;
     if (opt_level() > 0 && size_speed_goal() > SIZE_MATTERS_MOST) {
         if (close_loops_by_tests()) rebuildcfg();
-        skip_decided_entry_tests();
+        if (skip_decided_entry_tests()) rebuildcfg(); // what a test led to alone is no longer there
         if (opt_level() >= 2 && size_speed_goal() >= SPEED_MATTERS && duplicate_tails()) {
             renumber_bblocks();
-            skip_decided_entry_tests();
+            if (skip_decided_entry_tests()) rebuildcfg();
         }
         lay_out_blocks();
     }

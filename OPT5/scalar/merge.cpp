@@ -43,6 +43,7 @@ constexpr size_t MOST_POINTERS = 6; // of a loop: the target has eight address r
 constexpr double STEP_COST = 2;     // a pointer's step becomes part of an access
 constexpr double COUNTER_COST = 3;  // a counter's step
 constexpr double MULTIPLY_COST = 2; // beyond its node
+constexpr double WORTH_A_VARIABLE = 6; // an address that stays throughout the loop
 
 struct USE {
     NODE** place;
@@ -70,6 +71,12 @@ struct GROUP {
 std::string text_of(int64_t v) { return std::to_string(v); }
 
 std::unordered_set<const SYMTAB*> skewed_offset_syms; // looked up only
+
+double cost_of_tree(const NODE* t) {
+    double cost = 0;
+    for_each_subtree(t, [&](const NODE* n) { cost += 1 + (n->op == MULT ? MULTIPLY_COST : 0); });
+    return cost;
+}
 
 // ---- The addresses of a loop
 
@@ -109,10 +116,16 @@ private:
         const bool moves = std::any_of(use.address.begin(), use.address.end(),
                                        [&](const auto& t) { return facts.is_induction(t.tree); });
         // A pointer that steps by itself is as good as one that steps beside it.
-        if (!moves && (use.address.is_constant() || !facts.is_induction(base_symbol(use.address)))) return false;
+        const bool base_moves = facts.is_induction(base_symbol(use.address));
+        if (!moves && (base_moves ? use.address.is_constant() : !stays_and_costs(use))) return false;
         use.nodes = count_nodes_in_tree(*place);
         group_for(use).uses.push_back(std::move(use));
         return true;
+    }
+
+    // An address that no loop moves is computed once. One that stays in this loop alone moves in a loop around it, perhaps.
+    bool stays_and_costs(const USE& use) const {
+        return !loop->parent && !use.address.is_constant() && cost_of_tree(*use.place) >= WORTH_A_VARIABLE;
     }
 
     static const SYMTAB* base_symbol(const LINEAR_ADDRESS& a) { return a.base->op == NAME ? a.base->u.sym : nullptr; }
@@ -202,12 +215,6 @@ void MERGE::split_by_offsets() {
     groups = std::move(parts);
 }
 
-double cost_of_tree(const NODE* t) {
-    double cost = 0;
-    for_each_subtree(t, [&](const NODE* n) { cost += 1 + (n->op == MULT ? MULTIPLY_COST : 0); });
-    return cost;
-}
-
 // The address without what moves; what moves alone; a constant that belongs to the part that stays.
 LINEAR_ADDRESS without_inductions(LINEAR_ADDRESS a, const LOOP_FACTS& facts) {
     a.keep_if([&](const auto& t) { return !facts.is_induction(t.tree); });
@@ -253,6 +260,9 @@ void MERGE::appraise(GROUP& g) {
     g.step_growth += g.uses.front().nodes + 6;
     g.base_growth += g.uses.front().nodes + 2;
     g.step_gain -= stepping;
+    const bool moves = base_moves || std::any_of(g.address.begin(), g.address.end(),
+                                                 [&](const auto& t) { return facts.is_induction(t.tree); });
+    if (!moves) g.step_gain = -1;
     if (base_moves || is_trivial(without_inductions(g.address, facts))) g.base_gain = -1;
     g.entry_cost = 2 + cost_of_tree(*g.uses.front().place);
 }

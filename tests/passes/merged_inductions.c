@@ -192,6 +192,18 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
     for (int i = 0; i < n; i++) y[i] = x[i] * x[i + 1];
 }
 
+// An address that stays is computed ahead of the loop; the load is not, for the loop stores to what it reads.
+// FUNCTION: settled
+// COUNT 1: PMCONV((long)k
+// HAS: s += *$O$P0 * *$O$P1
+void settled(int k, int n, long s) {
+    for (int i = 0; i < n; i++) {
+        s += m[k][3] * w[i];
+        w[i] = s;
+        m[i & 7][3]++;
+    }
+}
+
 // Two counters of one value are one, which may be read behind the loop; a use between their steps sees them differ.
 // FUNCTION: together
 // COUNT 0: p +=
@@ -234,6 +246,8 @@ int main(void) {
     put_i32(changing_steps(60) + tested_late(-1UL, 5) * 7 + tested_late(9, 5));
     kept_apart(a, b, 30);
     put_i16(b[29] + b[3]);
+    settled(2, 20, 5);
+    put_i32(w[19] ^ m[2][3]);
     put_i16(together(a, 9) + together(a, 0) + apart(a, 5));
     return 0;
 }

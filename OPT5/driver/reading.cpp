@@ -40,7 +40,7 @@ using fact::none;
 const ROW rows[] = {
     // kind, name, frame, condition, action, needs, leaves
     {F,     "find synonyms",               nullptr, always, check_for_synonym_function_in_pass_1, none, graph},
-    {IDLE,  "find integrable functions",   nullptr, always, check_integrable_definition, none, none},
+    {F,     "find integrable functions",   nullptr, always, check_integrable_definition, none, none},
     {FIXED, "sequence",                    nullptr, always, [] { seq_trees(L2() ? propagate_global_constants : nullptr); }, none, none},
     {FIXED, "build graph",                 nullptr, always, buildcfg, none, fact::block_numbers},
     {F,     "tail recursion",              nullptr, always, remove_tail_recursion, none, graph},

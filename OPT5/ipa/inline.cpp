@@ -58,14 +58,17 @@ bool is_inline_candidate(const CALLSITE& site, const char** reason) {
     return says(reason, "no inlining conditions apply", false);
 }
 
+bool has_body_to_copy(FUNINFO* f) {
+    return f->symbol && f->size && f->bb_list && !f->symbol->type->getr(TYPE::tpk_func)->vararg() && !f->has_eh();
+}
+
 bool is_inlineable(const CALLSITE& site, const char** reason) {
     FUNINFO* callee = site.callee;
     if (TEST_FLAG(callee, FUN_cannot_inline | FUN_never_returns)) return says(reason, "cannot-inline or never-returns", false);
     if (TEST_FLAG(callee, FUN_follows_call) && !has_inline_qualifier(callee) && !site.forced)
         return says(reason, "fun-follows-call auto-inline", false);
     if (!function_is_defined(callee)) return says(reason, "not defined", false);
-    if (!callee->symbol || !callee->size || callee->symbol->type->getr(TYPE::tpk_func)->vararg() || !callee->bb_list)
-        return says(reason, "varargs or body problems", false);
+    if (!has_body_to_copy(callee)) return says(reason, "varargs or body problems", false);
     return says(reason, "", true);
 }
 
@@ -131,7 +134,7 @@ void save_bodies_below(const INLINE_FILE& file) {
             FUNINFO* callee = c->callee;
             if (!seen.insert(callee).second) continue;
             work.push_back(callee);
-            if (!callee->bb_list || callee->saved_cfg || TEST_FLAG(callee, FUN_cannot_inline)) continue;
+            if (callee->saved_cfg || TEST_FLAG(callee, FUN_cannot_inline) || !has_body_to_copy(callee)) continue;
             sym_split(callee);
             save_cfg(callee);
         }

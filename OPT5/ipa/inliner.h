@@ -125,6 +125,8 @@ bool arguments_fit_parameters(const NODE* call, const SYMTAB* callee);
 bool is_inline_candidate(const CALLSITE& site, const char** reason);
 bool is_inlineable(const CALLSITE& site, const char** reason);
 bool has_inline_qualifier(const FUNINFO* f);
+// Not so for one that finds its further arguments by the address of the last, nor for one with an exception table.
+bool has_body_to_copy(FUNINFO* f);
 bool inline_commentary_is_on();
 // To the debug stream and, with an info file, to that.
 void inline_commentary(const char* format, ...) __attribute__((format(printf, 1, 2)));

@@ -13,6 +13,7 @@
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/ipa/copy_cfg.h"
+#include "OPT5/ipa/inliner.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
@@ -38,8 +39,8 @@ namespace {
 constexpr long DEFAULT_DEPTH_LIMIT = 10;
 
 long depth_limit() {
-    const long limit = file_options ? file_options->getnumarg(option_obj::OO_inline_recursion_limit) : 0;
-    return limit > 0 ? limit : DEFAULT_DEPTH_LIMIT;
+    const auto option = option_obj::OO_inline_recursion_limit;
+    return file_options && file_options->getopt(option) ? file_options->getnumarg(option) : DEFAULT_DEPTH_LIMIT;
 }
 
 bool is_chosen(const CALL_RECORD* record) {
@@ -98,7 +99,8 @@ bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
     if (left_alone.count(call)) return false;
     FUNINFO* callee = find_FUNINFO_for_call(call);
     if (!callee || !callee->symbol || !callee->saved_cfg) return false;
-    if ((!is_chosen(call->call) && !deep) || currfuninfo->has_eh()) {
+    const bool is_wanted = is_chosen(call->call) || (deep && arguments_fit_parameters(call, callee->symbol));
+    if (!is_wanted || currfuninfo->has_eh()) {
         unsuppress_inline_function(callee);
         left_alone.insert(call);
         return false;

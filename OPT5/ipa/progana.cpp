@@ -1,6 +1,45 @@
-// What the reader asks of this room for passes that are not built yet.
+// Which definitions call integration may copy, and what the reader asks of this room for passes that are not built yet.
 
 #include "OPT5/ipa/progana.h"
 
-void check_integrable_definition() {}
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+
+namespace {
+
+constexpr uint64_t WIDE = 17, WIDE_LOCALS_LIMIT = 256; // bits
+constexpr uint8_t FIXED_PARAMETER = 27;                // `flags` of a parameter that stays where the caller put it
+
+// Whether each expansion may have a copy of the local. `wide` sums up the bits of what no register holds.
+bool may_be_copied(const SYMTAB* s, uint64_t* wide) {
+    if (s->type->is_volatile() || (s->level == 1 && s->flags == FIXED_PARAMETER)) return false;
+    if (s->cqual & (CQ_MARKS_FUNCTION | CQ_GLOBAL_REGISTER)) return true;
+    switch (s->sclass) {
+    case SC_AUTO:
+    case SC_REGISTER:
+    case SC_MEMORY:
+    case SC_PARM:
+    case SC_REGISTER2:
+        if (s->size >= WIDE) *wide += s->size;
+        return true;
+    case SC_STATIC:
+    case SC_EXTERN:
+    case SC_DROPPED: return true;
+    default: return false;
+    }
+}
+
+} // namespace
+
+// A function that was asked to be inlined may have any amount of locals.
+void check_integrable_definition() {
+    FUNINFO* f = currfuninfo;
+    const bool asked_for = f->symbol->cqual & CQ_INLINE || find_pragma(f->symbol, PRG_FUNC_ALWAYS_INLINE);
+    uint64_t wide = 0;
+    bool may = true;
+    for (const SYMTAB* list : {f->new_syms, f->pending_syms, f->scalar_syms, f->memory_syms})
+        for (const SYMTAB* s = list; s && may; s = s->next) may = may_be_copied(s, &wide);
+    if (!may || (!asked_for && wide > WIDE_LOCALS_LIMIT)) set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
+}
+
 void make_symbol_groupable(SYMTAB*) {}

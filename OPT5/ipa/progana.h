@@ -66,6 +66,7 @@ bool propagate_call_flags(FUNINFO* caller, FUNINFO* callee); // whether the call
 // A body that only passes its parameters on to another function makes the two synonyms.
 void check_for_synonym_function_in_pass_1();
 bool is_synonym_function(const FUNINFO* f);
+// Marks a definition that call integration must not copy: a volatile local, a class that fits no copy, too many wide locals.
 void check_integrable_definition();
 void make_symbol_groupable(SYMTAB* sym);
 

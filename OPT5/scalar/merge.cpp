@@ -3,7 +3,8 @@
 // An access whose address is an invariant plus constant multiples of inductions gets a pointer of its own, which starts
 // at the address's value ahead of the loop. Addresses that differ by a constant share a pointer; the others have an
 // offset from it. Where the steps would cost more than they save, the invariant part of the address alone is computed
-// ahead of the loop. A counter that nothing needs but its own step and the test that leaves the loop gives its test to
+// ahead of the loop. A pointer of an inner loop that runs a known number of times is not set anew in each iteration of the
+// loop around it, but stepped from where the inner loop left it. A counter that nothing needs but its own step and the test that leaves the loop gives its test to
 // a pointer.
 //
 // Needs: loops and live variables; no saved environment. Leaves: block numbers.
@@ -34,6 +35,7 @@
 
 #include <algorithm>
 #include <map>
+#include <unordered_map>
 #include <unordered_set>
 
 namespace {
@@ -77,6 +79,13 @@ double cost_of_tree(const NODE* t) {
     for_each_subtree(t, [&](const NODE* n) { cost += 1 + (n->op == MULT ? MULTIPLY_COST : 0); });
     return cost;
 }
+
+// How far the pointer of a loop has come when the loop, which has one exit, is left.
+struct SWEEP {
+    const NATURAL_LOOP* loop;
+    int64_t distance;
+};
+using SWEEPS = std::unordered_map<const SYMTAB*, SWEEP>; // looked up only
 
 // ---- The addresses of a loop
 
@@ -152,7 +161,7 @@ private:
 
 class MERGE {
 public:
-    MERGE(NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all), loop(of), facts(all, of) {}
+    MERGE(NATURAL_LOOPS& all, NATURAL_LOOP* of, SWEEPS& s) : loops(all), loop(of), facts(all, of), sweeps(s) {}
     ~MERGE() {
         for (NODE* t : replaced) erase_tree(t);
     }
@@ -169,6 +178,11 @@ private:
     void rewrite(GROUP& g);
     void rewrite_with_base(GROUP& g);
     void step_beside(const GROUP& g);
+    void step_beside(const GROUP& g, const INDUCTION::STEP& step, int64_t by);
+    const INDUCTION* only_induction(const GROUP& g);
+    USE* inner_pointer(GROUP& g);
+    void carry_on(GROUP& g, USE& start);
+    void note_sweep(const GROUP& g);
     NODE* step_size(const INDUCTION::STEP& step, int64_t size);
     SYMTAB* make_temporary(NODE* value);
     void replace(const GROUP& g, USE& use, NODE* by, int form);
@@ -182,6 +196,7 @@ private:
     NATURAL_LOOPS& loops;
     NATURAL_LOOP* loop;
     LOOP_FACTS facts;
+    SWEEPS& sweeps;
     std::vector<GROUP> groups;
     const LOOP_TEST* mapped = nullptr;
     BBLK* ahead = nullptr;
@@ -424,16 +439,17 @@ NODE* MERGE::step_size(const INDUCTION::STEP& step, int64_t size) {
     return mk_NAME(sym);
 }
 
+void MERGE::step_beside(const GROUP& g, const INDUCTION::STEP& step, int64_t by) {
+    LIST* s = step.bb->statements;
+    while (s->first != step.statement) s = s->rest;
+    insert_behind(s, step.statement, s->psn);
+    s->first = maketree(by < 0 ? MINUSASG : PLUSASG, mk_NAME(g.sym), step_size(step, by < 0 ? -by : by), g.type,
+                        step.statement->ls);
+}
+
 void MERGE::step_beside(const GROUP& g) {
     auto add = [&](const INDUCTION& i, int64_t coefficient) {
-        for (const INDUCTION::STEP& step : i.steps) {
-            LIST* s = step.bb->statements;
-            while (s->first != step.statement) s = s->rest;
-            insert_behind(s, step.statement, s->psn);
-            const int64_t by = coefficient * step.by;
-            s->first = maketree(by < 0 ? MINUSASG : PLUSASG, mk_NAME(g.sym), step_size(step, by < 0 ? -by : by), g.type,
-                                step.statement->ls);
-        }
+        for (const INDUCTION::STEP& step : i.steps) step_beside(g, step, coefficient * step.by);
     };
     const LINEAR_ADDRESS& a = g.address;
     if (a.base->op == NAME && facts.is_induction(a.base->u.sym)) add(*facts.induction(a.base->u.sym), 1);
@@ -455,6 +471,100 @@ void MERGE::rewrite(GROUP& g) {
     }
     for (USE& use : g.uses) replace(g, use, mk_NAME(g.sym), 0);
     step_beside(g);
+}
+
+bool remove_statement(BBLK* bb, const NODE* statement) {
+    for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
+        LIST* cell = *link;
+        if (cell->first != statement) continue;
+        drop_statement(link);
+        return true;
+    }
+    return false;
+}
+
+// ---- Pointers of inner loops
+
+// The one induction that the addresses of the group move with, if it steps once in each iteration by a constant.
+const INDUCTION* MERGE::only_induction(const GROUP& g) {
+    const SYMTAB* moving = nullptr;
+    int count = 0;
+    auto look_at = [&](const NODE* t) {
+        if (t->op != NAME || !facts.is_induction(t->u.sym)) return;
+        moving = t->u.sym;
+        ++count;
+    };
+    look_at(g.address.base);
+    for (const auto& t : g.address) look_at(t.tree);
+    const INDUCTION* i = count == 1 ? facts.induction(moving) : nullptr;
+    if (!i || i->steps.size() != 1 || i->steps.front().amount) return nullptr;
+    const BBLK* bb = i->steps.front().bb;
+    return loops.around(bb) == loop && loops.dominates_latches(bb, loop) ? i : nullptr;
+}
+
+// Whether `later` stands behind `first` in the block.
+bool follows(const BBLK* bb, const NODE* later, const NODE* first) {
+    bool is_behind = false;
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        if (is_behind && s->first == later) return true;
+        is_behind |= s->first == first;
+    }
+    return false;
+}
+
+// The use that gives a pointer of an inner loop its start, once in each iteration and ahead of the group's step. The other
+// uses must stand where the pointer has that value, and so must a test that it takes over.
+USE* MERGE::inner_pointer(GROUP& g) {
+    const INDUCTION* i = only_induction(g);
+    if (!i) return nullptr;
+    const BBLK* test = mapped && carrier(*mapped) == &g ? mapped->bb : nullptr;
+    for (USE& use : g.uses) {
+        const NODE* t = use.statement;
+        if (t->op != ASG || use.place != &use.statement->right || t->left->op != NAME) continue;
+        auto it = sweeps.find(t->left->u.sym);
+        if (it == sweeps.end() || !compatible_types(t->left->type->stqs(), g.type, true)) continue;
+        BBLK* bb = use.bb;
+        if (loops.around(bb) != loop || !loops.dominates_latches(bb, loop) || !loops.dominates(bb, i->steps.front().bb))
+            continue;
+        if (bb->successors->rest || bb->successors->first != it->second.loop->header) continue;
+        if (test && (test == bb || !loops.dominates(test, bb))) continue;
+        if (std::all_of(g.uses.begin(), g.uses.end(), [&](const USE& other) {
+                return &other == &use || (other.bb == bb && follows(bb, other.statement, use.statement));
+            }))
+            return &use;
+    }
+    return nullptr;
+}
+
+// The pointer of the inner loop gets its start ahead of this one, and steps from where the inner loop leaves it.
+void MERGE::carry_on(GROUP& g, USE& start) {
+    SYMTAB* pointer = start.statement->left->u.sym;
+    g.address = start.address;
+    g.sym = pointer;
+    insert_at_end_of_body(ahead, maketree(ASG, mk_NAME(pointer), coerce_to_type(g.type, start_tree(g)), g.type));
+    const INDUCTION& i = *only_induction(g);
+    const INDUCTION::STEP step = i.steps.front();
+    const bool is_base = g.address.base->op == NAME && g.address.base->u.sym == i.sym;
+    const int64_t by = (is_base ? 1 : g.address.coefficient_of(i.sym)) * step.by - sweeps.at(pointer).distance;
+    for (USE& use : g.uses)
+        if (&use != &start) replace(g, use, mk_NAME(pointer), 0);
+    NODE* assignment = start.statement;
+    replaced.push_back(assignment->right);
+    assignment->right = mk_ICON(INT65(0), tp->int_t);
+    remove_statement(start.bb, assignment);
+    if (by) step_beside(g, step, by);
+}
+
+// Where the loop's one exit is a test after a known number of iterations, it is known how far its pointers have come.
+void MERGE::note_sweep(const GROUP& g) {
+    int exits = 0;
+    for (const BBLK* bb : loop->blocks)
+        for (const EDGE* e = bb->successors; e; e = e->rest) exits += !loops.contains(loop, e->first);
+    const INDUCTION* i = only_induction(g);
+    if (exits != 1 || !i || facts.tests().size() != 1 || facts.tests().front().counter != i) return;
+    int64_t last;
+    if (constant_trip_count(facts.tests().front(), &last) < 0) return;
+    sweeps[g.sym] = {loop, g.address.coefficient_of(i->sym) * (last - i->start)};
 }
 
 // The part that stays is computed ahead of the loop.
@@ -523,16 +633,6 @@ void MERGE::map_test(const LOOP_TEST& test) {
     replaced.push_back(compare);
 }
 
-bool remove_statement(BBLK* bb, const NODE* statement) {
-    for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
-        LIST* cell = *link;
-        if (cell->first != statement) continue;
-        drop_statement(link);
-        return true;
-    }
-    return false;
-}
-
 // Nothing reads the counter any more in the loop or behind it.
 void MERGE::remove_counter(const INDUCTION& i) {
     if (print_debug) debug_printf("\tAll uses of %s have been eliminated!\n", i.sym->name);
@@ -560,10 +660,14 @@ void MERGE::run() {
     int n = 0;
     for (GROUP& g : groups) {
         report(g, n++);
-        if (g.steps)
+        USE* start = g.steps ? inner_pointer(g) : nullptr;
+        if (start)
+            carry_on(g, *start);
+        else if (g.steps)
             rewrite(g);
         else if (g.stays_based)
             rewrite_with_base(g);
+        if (g.steps) note_sweep(g);
     }
     if (!mapped) return;
     map_test(*mapped);
@@ -586,9 +690,10 @@ void merge_symbols() {
     need(fact::loops | fact::live_variables);
     NATURAL_LOOPS& loops = *currfuninfo->loops;
     if (currfuninfo->lva_sym_count) eliminate_single_use_temps();
+    SWEEPS sweeps;
     for (const auto& loop : loops.inner_first())
         while (loop->inside < DEEPEST) {
-            MERGE merge(loops, loop.get());
+            MERGE merge(loops, loop.get(), sweeps);
             if (merge.unite()) continue; // what was known of the loop is stale
             merge.run();
             break;

@@ -192,6 +192,30 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
     for (int i = 0; i < n; i++) y[i] = x[i] * x[i + 1];
 }
 
+// A pointer of an inner loop with a known trip count goes on from where that loop left it; not where it may be left early,
+// where the outer counter steps ahead of it, or where the count is not known.
+// FUNCTION: nests
+// COUNT 6: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
+long nests(int n, int k) {
+    long s = 0;
+    for (int i = 0; i < 8; i++)
+        for (int j = 1; j < 6; j++) s = s * 3 + m[i][j];
+    for (int i = 0; i < 8; i++)
+        for (int j = 7; j >= 2; j -= 2) s = s * 5 + m[i][j] + m[j][i];
+    for (int i = 0; i < 8; i++)
+        for (int j = 0; j < 8 && s != 77; j++) s = s * 3 + m[i][j];
+    for (int i = -1; i++ < 7;)
+        for (int j = 0; j < 4; j++) s = s * 7 + m[i][j];
+    for (int i = 0; i < n; i += k)
+        for (int j = 0; j < n; j++) s = s * 3 + m[i][j];
+    for (int h = 0; h < 3; h++)
+        for (int i = h; i < 8; i++) {
+            if (m[i][0] == s) continue;
+            for (int j = 0; j < 3; j++) s = s * 3 + m[i][j];
+        }
+    return s;
+}
+
 // An address that stays is computed ahead of the loop; the load is not, for the loop stores to what it reads.
 // FUNCTION: settled
 // COUNT 1: PMCONV((long)k
@@ -246,6 +270,7 @@ int main(void) {
     put_i32(changing_steps(60) + tested_late(-1UL, 5) * 7 + tested_late(9, 5));
     kept_apart(a, b, 30);
     put_i16(b[29] + b[3]);
+    put_i32(nests(8, 3));
     settled(2, 20, 5);
     put_i32(w[19] ^ m[2][3]);
     put_i16(together(a, 9) + together(a, 0) + apart(a, 5));

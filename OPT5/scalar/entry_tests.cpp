@@ -232,10 +232,15 @@ private:
     std::optional<bool> outcome_at_end(BBLK* bb, const NODE* test, const TAIL& tail) {
         if (promises_an_iteration(bb))
             for (const bool outcome : {true, false})
-                if (target_of(test, outcome) == bb->dflink) return outcome;
+                if (target_of(test, outcome) == bb->dflink && enters_loop(bb, bb->dflink)) return outcome;
         const TAKEN_BACK condition(tail, 0, {copy_tree(test->left)});
         if (const auto outcome = constant_truth(condition.trees.front())) return outcome;
         return outcome_by_tests(bb, test);
+    }
+
+    bool enters_loop(const BBLK* from, const BBLK* to) const {
+        const NATURAL_LOOP* loop = loops.around(to);
+        return loop && loop->header == to && !loops.contains(loop, from);
     }
 
     // What earlier tests say of the condition as it is at the start of the block.

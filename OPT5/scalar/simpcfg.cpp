@@ -79,6 +79,20 @@ private:
 
 bool is_written_as_do(const PRAGMA* p) { return p->kind == PRG_SRC_LOOP && p->args.size() > 3 && p->args[3] == "do"; }
 
+bool is_promise(const NODE* t) {
+    return t->op == PPRAGMA && (t->pragma->kind == PRG_MUST_ITERATE || t->pragma->kind == PRG_PROB_ITERATE);
+}
+
+// The block leads to one that no other leads to, and which therefore heads no loop: the loop that promises were made of
+// is gone, and they would be taken for promises of the next one in the text.
+void drop_promises_in(BBLK* bb) {
+    for (LIST** link = &bb->statements; *link && (*link)->rest;)
+        if (is_promise((*link)->first))
+            drop_statement(link);
+        else
+            link = &(*link)->rest;
+}
+
 // A loop that has nothing but its test left, which stood on top, evaluates that once more than it has iterations: a
 // pragma in front of it promised something of the iterations, and a reader would take it for the tests.
 void drop_promises_of(BBLK* loop) {
@@ -89,7 +103,7 @@ void drop_promises_of(BBLK* loop) {
             LIST* s = *link;
             const PRAGMA* p = s->first->op == PPRAGMA ? s->first->pragma : nullptr;
             if (p && is_written_as_do(p)) tested_last = true;
-            if (tested_last || !p || (p->kind != PRG_MUST_ITERATE && p->kind != PRG_PROB_ITERATE)) {
+            if (tested_last || !is_promise(s->first)) {
                 link = &s->rest;
                 continue;
             }
@@ -213,7 +227,9 @@ private:
         std::vector<SUCCESSOR_CHANGE> changes;
         for (const EDGE* e = bb->successors; e; e = e->rest) {
             BBLK* target = end_of_jumps(e->first);
-            if (target != e->first) changes.push_back({e->first, target});
+            if (target == e->first) continue;
+            if (!bb->successors->rest && !e->first->predecessors->rest) drop_promises_in(bb);
+            changes.push_back({e->first, target});
         }
         if (changes.empty()) return false;
         change_successors(bb, changes);
@@ -244,6 +260,7 @@ private:
 
     // The BRANCH's cell becomes the first of the successor's statements.
     void take_over(BBLK* bb, BBLK* next) {
+        drop_promises_in(bb);
         LIST* cell = control_of(bb);
         LIST* first = next->statements;
         erase_tree(cell->first);

@@ -56,6 +56,36 @@ void only_a_test(void) {
     g[3] = (int)w;
 }
 
+// What was promised of a loop that is no more is not promised of the next one, nor of what leads there.
+// FUNCTION: left_at_once
+// COUNT 0: MUST_ITERATE
+// COUNT 1: if (!(c))
+long left_at_once(int n, int c) {
+    long s = 0;
+#pragma MUST_ITERATE(1, 1)
+    for (;;) {
+        s += g[n & 7];
+        break;
+    }
+    if (c) {
+        do s += g[n & 3] * 3;
+        while (--n > 0);
+    }
+    return s;
+}
+
+// FUNCTION: never_run
+// COUNT 0: MUST_ITERATE
+long never_run(int n) {
+    long s = 0;
+    int i = 7;
+#pragma MUST_ITERATE(, 1)
+    for (; i < 3; i++) s += g[i];
+    do s += g[n & 3] * 3;
+    while (--n > 0);
+    return s;
+}
+
 int main(void) {
     for (int i = 0; i < 8; i++) g[i] = i * i;
     put_i32(two_loops(8));
@@ -64,5 +94,6 @@ int main(void) {
     put_i32(nested(0));
     only_a_test();
     put_i16(g[3]);
+    put_i32(left_at_once(5, 0) + left_at_once(4, 1) + never_run(3));
     return 0;
 }

@@ -226,6 +226,7 @@ private:
         std::optional<bool> outcome = outcome_at_end(bb, test, tail);
         if (!outcome) return false;
         BBLK* target = target_of(test, *outcome);
+        if (target != bb->dflink) drop_promises_in(bb);
         return !(ends_in_promise(bb) && target != bb->dflink) && decide(bb, target);
     }
 

@@ -83,16 +83,6 @@ bool is_promise(const NODE* t) {
     return t->op == PPRAGMA && (t->pragma->kind == PRG_MUST_ITERATE || t->pragma->kind == PRG_PROB_ITERATE);
 }
 
-// The block leads to one that no other leads to, and which therefore heads no loop: the loop that promises were made of
-// is gone, and they would be taken for promises of the next one in the text.
-void drop_promises_in(BBLK* bb) {
-    for (LIST** link = &bb->statements; *link && (*link)->rest;)
-        if (is_promise((*link)->first))
-            drop_statement(link);
-        else
-            link = &(*link)->rest;
-}
-
 // A loop that has nothing but its test left, which stood on top, evaluates that once more than it has iterations: a
 // pragma in front of it promised something of the iterations, and a reader would take it for the tests.
 void drop_promises_of(BBLK* loop) {
@@ -260,7 +250,7 @@ private:
 
     // The BRANCH's cell becomes the first of the successor's statements.
     void take_over(BBLK* bb, BBLK* next) {
-        drop_promises_in(bb);
+        drop_promises_in(bb); // `next` heads no loop
         LIST* cell = control_of(bb);
         LIST* first = next->statements;
         erase_tree(cell->first);
@@ -290,6 +280,14 @@ private:
 };
 
 } // namespace
+
+void drop_promises_in(BBLK* bb) {
+    for (LIST** link = &bb->statements; *link && (*link)->rest;)
+        if (is_promise((*link)->first))
+            drop_statement(link);
+        else
+            link = &(*link)->rest;
+}
 
 void make_branch(BBLK* bb, LIST* control, BBLK* target) {
     NODE* tree = control->first;

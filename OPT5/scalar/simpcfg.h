@@ -43,6 +43,9 @@ void add_loop_annotation_from_profile();
 
 // The control statement of `bb` becomes a BRANCH to `target`; what it computed stays for its effects.
 void make_branch(BBLK* bb, LIST* control, BBLK* target);
+// Promises of iterations that the block makes of a loop that it no longer leads to: they would be taken for promises of the
+// next one in the text.
+void drop_promises_in(BBLK* bb);
 // Drops the edges that the control statement no longer names, and adds those that it does.
 bool resync_edges(BBLK* bb);
 bool remove_redundant_tests();

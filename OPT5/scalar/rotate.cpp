@@ -1,8 +1,11 @@
 // Layout of loops, ahead of the output: one conditional branch closes a loop.
 //
+// First whole stretches of the layout are exchanged; then a test that still stands on top of a loop is copied to where the
+// loop jumps back to it, first tests that are decided are passed by, and the blocks find their order (layout.cpp).
+//
 // Needs: block numbers, which are layout positions here. Leaves: them.
 // Sound because the order of blocks in the output means nothing by itself: the writer adds a jump where a block does
-// not fall into its successor. Only a pragma that promises something of the loop behind it in the text depends on the
+// not fall into its successor; a copied test is asked where the original would have been asked next. Only a pragma that promises something of the loop behind it in the text depends on the
 // layout, so no block moves in between.
 
 #include "OPT5/scalar/simpcfg.h"

@@ -5,6 +5,7 @@
 //     entry_tests.cpp     first tests of loops                traces.cpp          layout by profile, annotations
 //     cross_jump.cpp      shared tails                        cond_paths.cpp      copies of tests on edges
 //     diamonds.cpp        selects                             superblocks.cpp     constants along chains of blocks
+//     layout.cpp          the order of blocks                 tail_copies.cpp     copies of tails in place of jumps
 #pragma once
 
 #include <cstdio>
@@ -52,6 +53,7 @@ bool remove_redundant_tests();
 bool cross_jump();
 // Loops whose first test is decided are entered behind it; needs layout positions for depth-first numbers.
 bool skip_decided_entry_tests();
+// Orders the blocks for as few jumps as possible; blocks are numbered before and after.
 void lay_out_blocks();
 bool join_diamonds();
 bool may_be_arm_of_select(const NODE* assignment); // cheap, and safe where the condition does not hold

@@ -63,14 +63,6 @@ NODE* constant_against_known_bits(NODE* t, struct LOOP* loop) {
     return narrow_to_mask(&t->left, t->op == ANDB ? c : mask & ~c) ? simp_node(t, loop) : nullptr;
 }
 
-// (x & c1) | c2 with no bit left for the mask to clear.
-NODE* mask_under_or(NODE* t, struct LOOP* loop) {
-    if (t->op != ORB || !is_icon(t->right) || !is_node_with_icon(t->left, ANDB)) return nullptr;
-    if ((bits_of(t->left->right) | bits_of(t->right)) != mask_of(t->type)) return nullptr;
-    t->left = only_left(t->left);
-    return simp_node(t, loop);
-}
-
 // The terms of a chain of ors: one is masked by a constant, the others lie inside of `c` or are constants.
 bool one_term_is_masked(const NODE* t, uint64_t c, int* masked, int* terms) {
     if (is_node(t, ORB)) {
@@ -107,32 +99,9 @@ NODE* mask_into_or(NODE* t, struct LOOP* loop) {
     return masked_terms(take_left(t), c, loop);
 }
 
-// ---- Operands that meet
-bool is_complement_of(const NODE* a, const NODE* b) { return is_unary(a, NOTB) && same_value(a->left, b); }
-
 NODE* meet_itself(NODE* t, struct LOOP*) {
-    if (same_value(t->left, t->right)) return t->op == XORB ? constant_for(t, INT65(0)) : only_left(t);
-    if (is_complement_of(t->left, t->right) || is_complement_of(t->right, t->left))
-        return constant_for(t, INT65(t->op == ANDB ? 0 : -1));
-    return nullptr;
-}
-
-// ~x & ~y is ~(x | y); ~x ^ y is ~(x ^ y); ~x ^ c is x ^ ~c.
-NODE* complements_outward(NODE* t, struct LOOP* loop) {
-    const bool left = is_unary(t->left, NOTB), right = is_unary(t->right, NOTB);
-    TYPE* type = t->type;
-    if (t->op == XORB && left && is_icon(t->right)) {
-        t->left = take_left(t->left);
-        set_icon(t->right, ~t->right->u.lval);
-        return simp_node(t, loop);
-    }
-    if (t->op == XORB ? !left && !right : !left || !right) return nullptr;
-    if (left) t->left = take_left(t->left);
-    if (right) t->right = take_left(t->right);
-    if (t->op != XORB) t->op = t->op == ANDB ? ORB : ANDB;
-    const bool complements = t->op != XORB || left != right;
-    t = simp_node(t, loop);
-    return complements ? made(NOTB, t, nullptr, type, loop) : t;
+    if (!same_value(t->left, t->right)) return nullptr;
+    return t->op == XORB ? constant_for(t, INT65(0)) : only_left(t);
 }
 
 // (x & y) op (x & z) is x & (y op z), and for | and & exchanged.
@@ -205,10 +174,8 @@ const RULE bit_rules[] = {trivial_constant,
                           constant_of_right_operand_outward,
                           mask_into_or,
                           constant_against_known_bits,
-                          mask_under_or,
                           meet_itself,
                           by_pattern,
-                          complements_outward,
                           invert_compare,
                           factor_out,
                           common_shift_outward,
@@ -216,27 +183,6 @@ const RULE bit_rules[] = {trivial_constant,
                           join_compares};
 
 // ---- Unary operators
-NODE* negate_sum(NODE* t, struct LOOP* loop) {
-    NODE* inner = t->left;
-    if (is_unary(inner, NOTB)) { // -~x
-        NODE* x = take_left(inner);
-        return simp_node(to_binary(t, PLUS, x, icon_of(INT65(1), t)), loop);
-    }
-    if (is_node(inner, MINUS) && (is_icon(inner->left) || (is_pure(inner->left) && is_pure(inner->right)))) {
-        std::swap(inner->left, inner->right);
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
-    if (is_node_with_icon(inner, PLUS) && (!is_signed(t->type) || inner->right->u.lval != int_type_min(t->type))) {
-        set_icon(inner->right, -inner->right->u.lval);
-        std::swap(inner->left, inner->right);
-        inner->op = MINUS;
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
-    return nullptr;
-}
-
 // -(x < 0) is x >> (width - 1).
 NODE* negated_sign_test(NODE* t, struct LOOP* loop) {
     NODE* test = t->left->op == SCONV ? t->left->left : t->left;
@@ -252,49 +198,13 @@ NODE* negated_sign_test(NODE* t, struct LOOP* loop) {
     return coerced(type, made(SRL, x, mk_ICON(INT65(static_cast<long>(from->size) - 1), tp->int_t), from, loop), loop);
 }
 
-NODE* complement_sum(NODE* t, struct LOOP* loop) {
-    NODE* inner = t->left;
-    if (is_equal_width_cast(inner)) { // ~(T)x is (T)~x
-        TYPE* type = t->type;
-        NODE* x = take_left(inner);
-        erase_node(t);
-        TYPE* from = x->type->stqs();
-        return coerced(type, made(NOTB, x, nullptr, from, loop), loop);
-    }
-    if (is_unary(inner, UMINUS)) { // ~-x is x - 1
-        NODE* x = take_left(inner);
-        return simp_node(to_binary(t, PLUS, x, icon_of(INT65(-1), t)), loop);
-    }
-    if (is_node_with_icon(inner, PLUS) || is_node_with_icon(inner, MINUS)) { // ~(x + c) is ~c - x
-        const INT65 c = ~(inner->op == PLUS ? inner->right->u.lval : -inner->right->u.lval);
-        if (!fits_or_wraps(c, inner->type)) return nullptr; // x - the least number
-        set_icon(inner->right, c);
-        inner->op = MINUS;
-        std::swap(inner->left, inner->right);
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
-    if (is_node(inner, MINUS) && is_icon(inner->left)) { // ~(c - x) is x + ~c
-        set_icon(inner->left, ~inner->left->u.lval);
-        std::swap(inner->left, inner->right);
-        inner->op = PLUS;
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
-    if (is_node_with_icon(inner, XORB)) {
-        set_icon(inner->right, ~inner->right->u.lval);
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
-    // ~(~x & y) is x | ~y
-    if ((is_node(inner, ANDB) || is_node(inner, ORB)) && is_unary(inner->left, NOTB)) {
-        inner->left = take_left(inner->left);
-        inner->op = inner->op == ANDB ? ORB : ANDB;
-        inner->right = made(NOTB, inner->right, nullptr, inner->type, loop);
-        erase_node(t);
-        return simp_node(inner, loop);
-    }
-    return nullptr;
+// ~(T)x is (T)~x.
+NODE* complement_under_cast(NODE* t, struct LOOP* loop) {
+    if (!is_equal_width_cast(t->left)) return nullptr;
+    TYPE* type = t->type;
+    NODE* x = take_left(take_left(t));
+    TYPE* from = x->type->stqs();
+    return coerced(type, made(NOTB, x, nullptr, from, loop), loop);
 }
 
 } // namespace
@@ -314,8 +224,8 @@ NODE* simp_unary(NODE* t, struct LOOP* loop) {
         NODE* operand = take_left(take_left(t));
         return coerce_to_type(type, operand);
     }
-    if (NODE* r = t->op == UMINUS ? negate_sum(t, loop) : complement_sum(t, loop)) return r;
-    if (NODE* r = t->op == UMINUS ? negated_sign_test(t, loop) : by_pattern(t, loop)) return r;
+    if (NODE* r = by_pattern(t, loop)) return r;
+    if (NODE* r = t->op == UMINUS ? negated_sign_test(t, loop) : complement_under_cast(t, loop)) return r;
     return simp_by_known_bits(t);
 }
 

@@ -106,7 +106,7 @@ NODE* test_of_bits(NODE* shift, uint64_t mask, struct LOOP* loop) {
     set_icon(c, INT65(0, mask << shift_count_of(shift)));
     erase_node(shift->right);
     erase_node(shift);
-    return made(ANDB, x, c, type, loop);
+    return without_idle_layers(made(ANDB, x, c, type, loop));
 }
 
 // (x >> n) & c, also with a narrowing cast between, and x >> (width - 1), look at some bits of x.

@@ -177,26 +177,6 @@ NODE* move_constant_across(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
-// x ^ c1 == c2, -x == c, ~x rel c
-NODE* undo_on_constant(NODE* t, struct LOOP* loop) {
-    NODE* inner = t->left;
-    if (!is_icon(t->right)) return nullptr;
-    const INT65 c = t->right->u.lval;
-    if (is_unary(inner, NOTB)) {
-        t->op = is_equality(t) ? t->op : commute_inv[t->op];
-        set_icon(t->right, ~c);
-    } else if (is_equality(t) && is_unary(inner, UMINUS)) {
-        set_icon(t->right, -c);
-    } else if (is_equality(t) && is_node_with_icon(inner, XORB)) {
-        set_icon(t->right, c ^ inner->right->u.lval);
-        erase_node(inner->right);
-    } else {
-        return nullptr;
-    }
-    t->left = take_left(inner);
-    return simp_node(t, loop);
-}
-
 TYPE* signed_form(TYPE* t) {
     return is_signed(t) ? t : t == tp->uint_t ? tp->int_t : t == tp->ulong_t ? tp->long_t : tp->llong_t;
 }
@@ -218,15 +198,10 @@ NODE* test_against_zero(NODE* t, struct LOOP* loop) {
         set_icon(t->right, INT65(0));
         return simp_node(t, loop);
     }
-    // x - y == 0, x ^ y == 0
-    if (is_node(inner, MINUS) || is_node(inner, XORB) || is_pointer_difference(inner)) {
+    if (is_pointer_difference(inner)) {
         erase_node(t->right);
         t->left = inner->left;
         t->right = take_right(inner);
-        return simp_node(t, loop);
-    }
-    if (is_unary(inner, ABS)) {
-        t->left = take_left(inner);
         return simp_node(t, loop);
     }
     // x % 2^k == 0: the low bits, whatever the sign
@@ -268,58 +243,6 @@ NODE* compare_arms(NODE* t, struct LOOP* loop) {
     return coerce_to_type(type, of_a ? condition : simp_node(invert_boolean_tree(condition), loop));
 }
 
-// ---- Both sides
-// x + y == x, x - y == x, x ^ y == x: y is zero.  x + z == y + z: x == y.
-NODE* cancel_common_term(NODE* t, struct LOOP* loop) {
-    if (!is_equality(t) || is_icon(t->right)) return nullptr;
-    for (int side = 0; side < 2; ++side) {
-        NODE *inner = side ? t->right : t->left, *x = side ? t->left : t->right;
-        if ((inner->op != PLUS && inner->op != MINUS && inner->op != XORB) || !operands_have_type(inner) ||
-            !is_pure(inner))
-            continue;
-        NODE* rest = same_value(inner->left, x)                          ? inner->right
-                     : inner->op != MINUS && same_value(inner->right, x) ? inner->left
-                                                                         : nullptr;
-        if (!rest) continue;
-        NODE *y = copy_tree(rest), *zero = icon_of(INT65(0), rest);
-        erase_tree(t->left);
-        erase_tree(t->right);
-        t->left = y;
-        t->right = zero;
-        return simp_node(t, loop);
-    }
-    NODE *l = t->left, *r = t->right;
-    if (!is_pure(l) || !is_pure(r)) return nullptr;
-    const bool alike = l->op == r->op && (l->op == PLUS || l->op == MINUS || l->op == XORB) && operands_have_type(l) &&
-                       operands_have_type(r) && same_integers(l->type, r->type);
-    if (!alike) return nullptr;
-    const bool right = same_value(l->right, r->right), left = !right && same_value(l->left, r->left);
-    if (!right && !left) return nullptr;
-    if (right) {
-        erase_tree(l->right);
-        erase_tree(r->right);
-        t->left = take_left(l);
-        t->right = take_left(r);
-    } else {
-        erase_tree(l->left);
-        erase_tree(r->left);
-        t->left = take_right(l);
-        t->right = take_right(r);
-    }
-    return simp_node(t, loop);
-}
-
-// -x == -y, ~x rel ~y
-NODE* undo_on_both(NODE* t, struct LOOP* loop) {
-    NODE *l = t->left, *r = t->right;
-    const bool negations = is_equality(t) && is_unary(l, UMINUS) && is_unary(r, UMINUS);
-    if (!negations && !(is_unary(l, NOTB) && is_unary(r, NOTB))) return nullptr;
-    t->left = take_left(l);
-    t->right = take_left(r);
-    if (!is_equality(t)) t->op = commute_inv[t->op];
-    return simp_node(t, loop);
-}
-
 // (T)x rel (T)y and (T)x rel c, where the cast widens: compared as the narrow type has it.
 NODE* compare_uncast(NODE* t, struct LOOP* loop) {
     NODE *l = t->left, *r = t->right;
@@ -359,9 +282,9 @@ NODE* compare_low_bits(NODE* t, struct LOOP* loop) {
 }
 
 const RULE compare_rules[] = {
-    decide,           compare_truth_value, compare_single_bit, order_at_the_end, move_constant_across, undo_on_constant,
-    by_pattern,       test_against_zero,   compare_computed,   compare_arms,     cancel_common_term,   undo_on_both,
-    compare_low_bits, compare_uncast};
+    decide,        compare_truth_value, compare_single_bit, order_at_the_end, move_constant_across,
+    by_pattern,    test_against_zero,   compare_computed,   compare_arms,     compare_low_bits,
+    compare_uncast};
 
 // ---- Pointers
 bool is_null(const NODE* t) {

@@ -25,6 +25,7 @@ bool is_signed_type(FOUND& f) { return is_signed(f.type); }
 bool is_unsigned_type(FOUND& f) { return !is_signed(f.type); }
 bool constant_less_one_fits(FOUND& f) { return fits_or_wraps(f.constant[FOUND::C] - INT65(1), f.type); }
 bool constant_and_one_fits(FOUND& f) { return fits_or_wraps(f.constant[FOUND::C] + INT65(1), f.type); }
+bool negative_fits(FOUND& f) { return fits_or_wraps(-f.constant[FOUND::C], f.type); }
 bool masks_are_disjoint(FOUND& f) { return !(bits(f, FOUND::C) & bits(f, FOUND::D)); }
 bool second_count_is_greater(FOUND& f) { return f.constant[FOUND::E] > f.constant[FOUND::C]; }
 bool second_count_is_less(FOUND& f) { return f.constant[FOUND::E] < f.constant[FOUND::C]; }
@@ -112,6 +113,7 @@ int kind_of(int op) {
     case UGE: return 21;
     case GT:
     case UGT: return 22;
+    case ABS: return 23;
     default: return OTHER;
     }
 }
@@ -218,6 +220,7 @@ private:
         case QUEST: return choice(t, n);
         case ICALL: return extremum(t, n);
         case NOTB:
+        case ABS:
         case UMINUS: return operand_has_type(n) && match(t->left, &n->left, n->type);
         default:
             if (op_is_int_compare(t->op)) return compare(t, n);
@@ -351,6 +354,7 @@ private:
 
     NODE* compare(const TERM* t, TYPE* type) {
         TYPE* of = type_of(t->left);
+        if (!of) of = type_of(t->right);
         NODE* a = build(t->left, of);
         NODE* b = build(t->right, of);
         const int op = is_order(t->op) && of->is_unsigned() ? t->op + (ULE - LE) : t->op;

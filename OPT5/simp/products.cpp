@@ -71,26 +71,6 @@ NODE* multiply_negation(NODE* t, struct LOOP* loop) {
     return left != right ? made(UMINUS, t, nullptr, type, loop) : t;
 }
 
-// |x| * |x| is x * x.
-NODE* multiply_absolutes(NODE* t, struct LOOP* loop) {
-    if (!is_unary(t->left, ABS) || !is_unary(t->right, ABS) || !same_value(t->left, t->right)) return nullptr;
-    t->left = take_left(t->left);
-    t->right = take_left(t->right);
-    return simp_node(t, loop);
-}
-
-// (x >> n) * 2^n clears the low bits.
-NODE* multiply_shifted_back(NODE* t, struct LOOP* loop) {
-    NODE* inner = t->left;
-    const int n = log2_of(t->right);
-    if (n <= 0 || inner->op != SRL || shift_count_of(inner) != n) return nullptr;
-    erase_node(inner->right);
-    t->left = take_left(inner);
-    t->op = ANDB;
-    set_icon(t->right, -t->right->u.lval);
-    return simp_node(t, loop);
-}
-
 // x * c1 * c2, (x << n) * c, and the constant of either operand moved outward: what is multiplied by it, which is no
 // 0, 1 or -1, is smaller than the product.
 NODE* join_factors(NODE* t, struct LOOP* loop) {
@@ -180,16 +160,8 @@ NODE* multiply_under_cast(NODE* t, struct LOOP* loop) {
     return simp_node(t, loop);
 }
 
-const RULE product_rules[] = {multiply_by_small_constant,
-                              multiply_negation,
-                              multiply_absolutes,
-                              multiply_shifted_back,
-                              join_factors,
-                              distribute,
-                              undo_exact_division,
-                              multiply_truth_values,
-                              multiply_under_cast,
-                              by_pattern};
+const RULE product_rules[] = {multiply_by_small_constant, multiply_negation,     join_factors,        distribute,
+                              undo_exact_division,        multiply_truth_values, multiply_under_cast, by_pattern};
 
 // ---- Powers: x ** n times x ** m
 bool same_base(const NODE* power, const NODE* x) { return power->op == EXPT && same_value(power->left, x); }

@@ -194,24 +194,9 @@ NODE* factor_out(NODE* t, struct LOOP* loop) {
     return nullptr;
 }
 
-// ---- Bits
-// ~x + c is (c - 1) - x; c - ~x is x + (c + 1).
-NODE* sum_with_complement(NODE* t, struct LOOP* loop) {
-    const bool adds = t->op == PLUS && is_icon(t->right) && is_unary(t->left, NOTB);
-    const bool subtracts = t->op == MINUS && is_icon(t->left) && is_unary(t->right, NOTB);
-    if (!adds && !subtracts) return nullptr;
-    NODE* icon = adds ? t->right : t->left;
-    const INT65 c = icon->u.lval + (adds ? INT65(-1) : INT65(1));
-    if (!fits_or_wraps(c, t->type)) return nullptr;
-    NODE* x = take_left(adds ? t->left : t->right);
-    if (!adds) return simp_node(as_constant_sum(t, x, c, icon), loop);
-    set_icon(icon, c);
-    return simp_node(to_binary(t, MINUS, icon, x), loop);
-}
-
-const RULE sum_rules[] = {drop_zero,  canonical_constant, join_constants,   constant_minus_sum,     remove_negations,
-                          cancel,     by_pattern,         constant_outward, join_distant_constants, join_equal_terms,
-                          factor_out, sum_with_complement};
+const RULE sum_rules[] = {drop_zero, canonical_constant, join_constants,   constant_minus_sum,     remove_negations,
+                          cancel,    by_pattern,         constant_outward, join_distant_constants, join_equal_terms,
+                          factor_out};
 
 NODE* simp_integer_sum(NODE* t, struct LOOP* loop) {
     if (!operands_have_type(t)) return t;

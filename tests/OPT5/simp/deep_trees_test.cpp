@@ -2,6 +2,7 @@
 
 #include "../ir/tree_builder.h"
 
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/simp.h"
 
 using namespace test_trees;
@@ -10,6 +11,10 @@ namespace {
 
 class DeepTrees : public Trees {
 protected:
+    static void SetUpTestSuite() {
+        start();
+        rules::compile_patterns();
+    }
     static constexpr int LEVELS = 50000; // two nodes or more each
 
     SYMTAB *xs = symbol("x", tp->int_t), *ys = symbol("y", tp->int_t), *ps = symbol("p", tp->mk_ptr(tp->int_t));

@@ -3,6 +3,7 @@
 #include "../ir/tree_builder.h"
 
 #include "OPT5/simp/simp.h"
+#include "OPT5/simp/patterns.h"
 #include "OPT5/simp/symbolic.h"
 
 #include <map>
@@ -24,6 +25,10 @@ struct LOOP* as_loop(ROUND* r) {
 
 class Symbolic : public Trees {
 protected:
+    static void SetUpTestSuite() {
+        start();
+        rules::compile_patterns();
+    }
     void SetUp() override {
         loop_callbacks.givens = [](const struct LOOP* l) -> const std::vector<NODE*>& { return behind(l)->givens; };
         loop_callbacks.parent = [](const struct LOOP* l) { return as_loop(behind(l)->around); };

@@ -2,7 +2,8 @@
 //
 // The block of the call is split ahead of its statement, the copy of the saved body stands between the two, and each
 // return becomes an assignment of the result and a branch. A call of the copy that was chosen in its own function is
-// expanded in the same walk. A call under a condition inside a statement gets blocks of its own first.
+// expanded in the same walk. A call under a condition inside a statement gets blocks of its own first; what a comma
+// evaluates ahead of a call becomes a statement.
 //
 // Needs: the saved bodies and the sets of call sites that the inliner made. Leaves: nothing; the graph is new.
 // Sound because what the call's statement evaluates beside the call has no order with it in the source: assignments
@@ -56,7 +57,7 @@ bool is_forced_deep(const CALL_RECORD* record) {
 // A call in a statement, and how it is evaluated there.
 struct SITE {
     NODE** slot = nullptr;
-    NODE** condition = nullptr; // the outermost QUEST, ANDAND or OROR that may leave it out; null: evaluated always
+    NODE** condition = nullptr; // the outermost QUEST, ANDAND, OROR or COMMAOP that evaluates another operand first, or null
 };
 
 class INTEGRATION {
@@ -79,6 +80,7 @@ private:
     bool find_site(NODE** slot, NODE** condition, bool deep, SITE* site);
     bool is_to_expand(NODE* call, bool deep);
     BBLK* expand(BBLK* bb, LIST* cell, NODE** slot);
+    void put_first_ahead(BBLK* bb, LIST* cell, NODE** comma);
     BBLK* separate(BBLK* bb, LIST* cell, NODE** condition);
     BBLK* split_ahead(BBLK* bb, LIST* cell);
     void bind_arguments(NODE* call, const CFG_COPY& copy, const FUNINFO* body, PSN* psn);
@@ -121,9 +123,9 @@ bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
 bool INTEGRATION::find_site(NODE** slot, NODE** condition, bool deep, SITE* site) {
     NODE* t = *slot;
     if (!t) return false;
-    const bool is_conditional = t->op == QUEST || t->op == ANDAND || t->op == OROR;
+    const bool has_order = t->op == QUEST || t->op == ANDAND || t->op == OROR || t->op == COMMAOP;
     if (find_site(&t->left, condition, deep, site)) return true;
-    if (find_site(&t->right, is_conditional && !condition ? slot : condition, deep, site)) return true;
+    if (find_site(&t->right, has_order && !condition ? slot : condition, deep, site)) return true;
     if (!op_is_call(t->op) || !is_to_expand(t, deep)) return false;
     *site = {slot, condition};
     return true;
@@ -137,6 +139,10 @@ void INTEGRATION::walk(BBLK* bb, const BBLK* end, bool deep) {
             current_psn = s->psn;
             if (tree_is_arg_prolog(s->first) || !find_site(&s->first, nullptr, deep, &site)) {
                 s = s->rest;
+                continue;
+            }
+            if (site.condition && (*site.condition)->op == COMMAOP) {
+                put_first_ahead(bb, s, site.condition);
                 continue;
             }
             if (site.condition) {
@@ -165,6 +171,16 @@ BBLK* INTEGRATION::split_ahead(BBLK* bb, LIST* cell) {
     }
     while (before->rest != cell) before = before->rest;
     return split_block(bb, before, false);
+}
+
+// Of `(a, b)` in a statement, `a` is a statement ahead of it, and of what is expanded in `b`.
+void INTEGRATION::put_first_ahead(BBLK* bb, LIST* cell, NODE** comma) {
+    NODE* t = *comma;
+    *comma = t->right;
+    LIST** link = &bb->statements;
+    while (*link != cell) link = &(*link)->rest;
+    if (NODE* effect = peel_for_effect(t->left)) insert_before(link, effect, cell->psn);
+    erase_node(t);
 }
 
 // `c ? a : b`, `c && a` or `c || b` inside a statement: a temporary that blocks ahead of it set. Returns the block that

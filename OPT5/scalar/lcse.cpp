@@ -353,7 +353,7 @@ private:
     void learn_store(const NODE* t, VALUE v);
     void read(NODE*& slot, bool is_certain);
     void read_operands(NODE* t, bool is_certain);
-    void read_place(NODE* t);
+    void read_place(NODE* t, bool is_certain);
     bool reuse(NODE*& slot, bool is_certain);
     SYMTAB* holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type);
     void keep(OCCURRENCES& known, VALUE v);
@@ -474,7 +474,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
         if (!is_plain) v = numbers.of_step(t, numbers.of(t->left), v);
         read(t->right, true);
     }
-    read_place(t->left);
+    read_place(t->left, true);
     numbers.forget_changed(t);
     if (v && code_of(t->left->type) == code_of(is_plain ? t->right->type : t->left->type)) learn_store(t, v);
 }
@@ -522,7 +522,7 @@ void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
     case UAND:
     case ARGREF:
     case STARG:
-    case STDOT: read_place(t->left); return;
+    case STDOT: read_place(t->left, is_certain); return;
     case ANDAND:
     case OROR:
     case QUEST:
@@ -537,9 +537,9 @@ void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
 }
 
 // The place is not read here, but the pointer that it lies behind is.
-void COMMON_SUBEXPRESSIONS::read_place(NODE* t) {
+void COMMON_SUBEXPRESSIONS::read_place(NODE* t, bool is_certain) {
     NODE* object = without_members(t);
-    if (object->op == UMULT || object->op == STREF) read(object->left, false);
+    if (object->op == UMULT || object->op == STREF) read(object->left, is_certain);
 }
 
 SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {

@@ -77,7 +77,7 @@ bool is_manifest_constant(const NODE* t) { return t->op == ICON || t->op == FCON
 
 class COLLECTION {
 public:
-    explicit COLLECTION(INLINE_FILE& f) : file(f) { need(fact::loops | fact::dominators); }
+    COLLECTION(INLINE_FILE& f, int (*measure)(const BBLK*)) : file(f), pressure_of(measure) { need(fact::loops | fact::dominators); }
 
     void run() {
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
@@ -112,6 +112,7 @@ private:
         site.callee = find_FUNINFO_for_call(call);
         site.id = call->call ? call->call->id : currfuninfo->unique_call_index;
         site.psn = psn;
+        site.type = call->left->type->is_pointer() ? call->left->type->type_pointed_to() : call->left->type;
         NODE* arguments = call->op == CALL ? call->right : nullptr;
         const int count = arg_list_count(arguments);
         site.nargs = static_cast<int8_t>(std::min(count, 127));
@@ -155,13 +156,15 @@ private:
         for (const NATURAL_LOOP* l = loop; l; l = l->parent) ++site.depth;
         site.postdom = currfuninfo->dominators->post_dominates(block, currfuninfo->bb_list);
         site.temp = block->dFreqIn >= 0 ? block->dFreqIn : 0;
+        if (pressure_of) site.pressure = pressure_of(block);
     }
 
     INLINE_FILE& file;
+    int (*const pressure_of)(const BBLK*);
     const BBLK* block = nullptr;
     const PSN* psn = nullptr;
 };
 
 } // namespace
 
-void collect_call_sites(INLINE_FILE& file) { COLLECTION(file).run(); }
+void collect_call_sites(INLINE_FILE& file, int (*pressure_of)(const BBLK*)) { COLLECTION(file, pressure_of).run(); }

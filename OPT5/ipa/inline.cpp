@@ -15,10 +15,19 @@
 #include <unordered_set>
 
 register_option pass_debug_inline_commentary("debug:inline_commentary");
+register_option pass_debug_inliner("debug:inliner"); // the strategy, 1 to 5
 
 std::unique_ptr<INLINER> inliner;
 
-void create_inliner() { inliner = std::make_unique<OLD_INLINER>(); }
+void create_inliner() {
+    switch (pass_debug_inliner) {
+    case 2: inliner = std::make_unique<REVISED_OLD_INLINER>(); break;
+    case 3: inliner = std::make_unique<NEW_INLINER>(); break;
+    case 4: inliner = std::make_unique<NEWER_INLINER>(); break;
+    case 5: inliner = std::make_unique<INLINER_5>(); break;
+    default: inliner = std::make_unique<OLD_INLINER>();
+    }
+}
 bool inline_recursion_is_limited() { return !inliner || inliner->warn_inline_recursion_limit(); }
 void init_proc_integration() { unsuppressed_funinfos.clear(); }
 void dump_psnrefs() {}

@@ -22,6 +22,20 @@ int64_t square(uint32_t time) { return static_cast<int64_t>(static_cast<uint32_t
 
 bool may_go_away(FUNINFO* f) { return f->sites_left == 0 && !TEST_FLAG(f, FUN_cannot_suppress); }
 
+bool is_validating() {
+    const register_option* validate = register_option::get_option("debug:validate");
+    return validate && *validate;
+}
+
+// All that a site changes before it is accepted.
+std::vector<uint32_t> estimates_of(const std::vector<FUNINFO*>& functions) {
+    std::vector<uint32_t> all;
+    for (const FUNINFO* f : functions)
+        for (uint32_t x : {f->est_time, f->est_bbs, f->est_syms, f->est_loops, f->est_ncalls, f->est_pressure, uint32_t(f->sites_left)})
+            all.push_back(x);
+    return all;
+}
+
 } // namespace
 
 struct INLINE_FILE::TRIAL {
@@ -54,14 +68,20 @@ void INLINE_FILE::add(FUNINFO* f, const DELTAS& d) {
 
 // Callers of callers come behind in call-graph order, but for cycles, which are not followed.
 void INLINE_FILE::cascade(FUNINFO* into, const DELTAS& d) {
-    std::map<int, std::pair<FUNINFO*, DELTAS>, std::greater<int>> waiting;
-    auto pass_on = [&](const FUNINFO* f, const DELTAS& delta) {
+    struct WAITING {
+        FUNINFO* f = nullptr;
+        DELTAS sum;
+        int depth = 0; // of the longest path of expansions
+    };
+    std::map<int, WAITING, std::greater<int>> waiting;
+    auto pass_on = [&](const FUNINFO* f, const DELTAS& delta, int depth) {
         auto it = into_m.find(f);
         if (it == into_m.end()) return;
         for (const CALLSITE* s : it->second) {
             if (s->caller->cg_order >= f->cg_order) continue;
-            auto& [g, sum] = waiting[s->caller->cg_order];
+            auto& [g, sum, d] = waiting[s->caller->cg_order];
             g = s->caller;
+            d = std::max(d, depth);
             sum.time += delta.time;
             sum.bbs += delta.bbs;
             sum.syms += delta.syms;
@@ -69,13 +89,13 @@ void INLINE_FILE::cascade(FUNINFO* into, const DELTAS& d) {
             sum.ncalls += delta.ncalls;
         }
     };
-    pass_on(into, d);
-    for (int depth = 1; !waiting.empty(); ++depth) {
-        auto [f, delta] = waiting.begin()->second;
+    pass_on(into, d, 1);
+    while (!waiting.empty()) {
+        auto [f, delta, depth] = waiting.begin()->second;
         waiting.erase(waiting.begin());
         if (static_cast<int32_t>(delta.time) > 0) inline_commentary("[cascaded inline (depth %d) into %s]\n", depth, f->name.c_str());
         add(f, delta);
-        pass_on(f, delta);
+        pass_on(f, delta, depth + 1);
     }
 }
 
@@ -170,6 +190,8 @@ void INLINE_FILE::pass(const SITES& sites, const SITE_PREDICATE& predicate, cons
         }
         OPT_ASSERT(caller != NULL);
         TRIAL trial;
+        std::vector<uint32_t> before;
+        if (is_validating()) before = estimates_of(functions);
         apply(site, &trial);
         const auto quadratic = static_cast<long>(quadratic_m);
         const auto linear = static_cast<int>(linear_m);
@@ -179,6 +201,7 @@ void INLINE_FILE::pass(const SITES& sites, const SITE_PREDICATE& predicate, cons
                               static_cast<long>(limits.quadratic), linear, static_cast<int>(limits.linear), loops,
                               static_cast<int>(limits.loops), bbs, static_cast<int>(limits.blocks));
             undo(site, trial);
+            OPT_ASSERT(before.empty() || before == estimates_of(functions));
             continue;
         }
         inline_commentary("  [accepting:  %ld vs %ld, %d vs %d, %d vs %d, pressure %d.]\n", quadratic,

@@ -13,7 +13,9 @@
 #include <unordered_map>
 #include <vector>
 
+class BBLK;
 class NODE;
+class TYPE;
 struct PSN;
 
 // One call of a function that was read.
@@ -22,6 +24,7 @@ struct CALLSITE {
     uint32_t id = 0;           // the bit in the caller's sets of call sites
     FUNINFO* callee = nullptr; // null for a call through a pointer
     const PSN* psn = nullptr;
+    TYPE* type = nullptr; // of the function that is called
     int16_t loop = 0;          // height of the block's loop in the nest: 1 for an innermost loop, 0 for none
     int16_t depth = 0;         // of the block's loop, 0 for none
     int8_t nargs = 0, nconstargs = 0;
@@ -112,13 +115,68 @@ public:
     int site_benefit(const CALLSITE&) override { return 1; }
 };
 
+// The strategy by size, for asked-for functions within a limit on growth.
+class REVISED_OLD_INLINER : public OLD_INLINER {
+public:
+    SITE_PREDICATE static_inlining_predicate() override;
+    void further_setup(INLINE_FILE& file, SITES& sites) override;
+};
+
+// By benefit over cost, leaves first.
+class NEW_INLINER : public INLINER {
+public:
+    SITE_PREDICATE static_inlining_predicate() override;
+    void further_setup(INLINE_FILE& file, SITES& sites) override;
+    void auto_inlining_passes(INLINE_FILE& file, const SITES& sites) override;
+    void collect_pass_1_info(INLINE_FILE& file) override;
+    int site_benefit(const CALLSITE& site) override;
+
+protected:
+    virtual void measure(); // the current function, whose blocks get frequencies
+    void set_limits(const INLINE_FILE& file);
+    static void sort_by_worth(SITES& sites);
+    static INLINE_LIMITS growth_limits(int64_t quadratic, int64_t linear);
+    // Passes until one accepts nothing.
+    static void waves(INLINE_FILE& file, const SITES& sites, const SITE_PREDICATE& predicate, const char* label,
+                      const INLINE_LIMITS& limits);
+    void pass_of_single_sites(INLINE_FILE& file, const SITES& sites);
+};
+
+// By frequency: counts flow through the call graph.
+class NEWER_INLINER : public NEW_INLINER {
+public:
+    void further_setup(INLINE_FILE& file, SITES& sites) override;
+    void auto_inlining_passes(INLINE_FILE& file, const SITES& sites) override;
+    int site_benefit(const CALLSITE& site) override;
+
+protected:
+    void measure() override;
+};
+
+// Benefit by frequency, in the order of benefit over cost.
+class INLINER_5 : public NEW_INLINER {
+public:
+    void further_setup(INLINE_FILE& file, SITES& sites) override;
+    int site_benefit(const CALLSITE& site) override;
+};
+
 extern std::unique_ptr<INLINER> inliner;
 
 // ---- Collecting (call_sites.cpp)
 
-// The sites of the current function, with what is known of their blocks.
-void collect_call_sites(INLINE_FILE& file);
+// The sites of the current function, with what is known of their blocks. Without `pressure_of` no pressure is measured.
+void collect_call_sites(INLINE_FILE& file, int (*pressure_of)(const BBLK*) = nullptr);
+void measure_sizes(); // estimates of the current function, before anything is expanded
 bool arguments_fit_parameters(const NODE* call, const SYMTAB* callee);
+
+// ---- What strategies by benefit share (new_inliner.cpp, fold_estimate.cpp)
+
+void drop_undesirable_sites(SITES& sites);
+void estimate_folding_of(const SITES& sites); // nothing where that is switched off
+void estimate_folding(CALLSITE& site);        // sets `fold_ratio`
+bool folding_is_estimated();
+bool profiles_are_ignored();
+void measure_density(bool known_only); // `known_only`: over the blocks that have a frequency
 
 // ---- Tests (inline.cpp). The reason of the last answer is kept for the commentary.
 

@@ -56,7 +56,7 @@ bool is_worth_its_size(const CALLSITE& site) {
 
 } // namespace
 
-void OLD_INLINER::collect_pass_1_info(INLINE_FILE& file) {
+void measure_sizes() {
     FUNINFO* f = currfuninfo;
     f->est_loops = 0;
     f->est_time = f->size;
@@ -64,6 +64,10 @@ void OLD_INLINER::collect_pass_1_info(INLINE_FILE& file) {
     f->est_syms = 0;
     for (const SYMTAB* s = f->scalar_syms; s; s = s->next) ++f->est_syms;
     f->is_leaf_estimate = f->no_calls;
+}
+
+void OLD_INLINER::collect_pass_1_info(INLINE_FILE& file) {
+    measure_sizes();
     collect_call_sites(file);
 }
 

@@ -1,0 +1,266 @@
+"""Which calls are inlined: a second statement of the rules predicts every decision on random call graphs.
+
+A function of a graph stores to a volatile variable and calls others, a call a line, so that its size and its calls are
+known here without the optimizer. Predicted are the accepted calls, the sizes, the definitions of the output and the
+functions that each of them still calls.
+"""
+import itertools
+import os
+import random
+import re
+import tempfile
+import unittest
+from dataclasses import dataclass, field
+from pathlib import Path
+
+from run import Tools, difference
+
+DEPTH_LIMIT = 10
+FORCED, DEEP, NEVER = "FORCEINLINE", "FORCEINLINE_RECURSIVE", "NOINLINE"
+WISHES = ("",) * 12 + (FORCED, DEEP, NEVER)
+SIZES = (5, 6, 9, 10, 11, 19, 20, 20, 21, 21, 60, 98, 99, 100, 101, 300)  # about the limits of the rules
+
+
+@dataclass
+class Call:
+    callee: int
+    pragma: str = ""
+    line: int = 0
+
+
+@dataclass
+class Function:
+    name: str
+    stores: int
+    odd: bool = False
+    calls: list = field(default_factory=list)
+    inline: bool = False
+    external: bool = False
+    always: bool = False
+    cannot: bool = False
+    taken: bool = False  # its address is
+
+    @property
+    def size(self):
+        """A parameter to its variable: 2; a store: 2, of a constant: 3; a call with the parameter: 1; the end: 1."""
+        return 2 + 2 * self.stores + 3 * self.odd + len(self.calls) + 1
+
+    def fill(self, size):
+        rest = max(size - self.size, 2)
+        self.odd = rest % 2 == 1 and rest > 3
+        self.stores = (rest - 3 * self.odd) // 2
+
+
+def random_graph(rng, cyclic):
+    """main is the last function; without cycles a function calls those ahead of it."""
+    count = rng.randint(4, 14)
+    inlines, graph = rng.choice((0.2, 0.7)), []
+    for i in range(count):
+        f = Function(f"f{i}", 0)
+        f.inline = rng.random() < inlines
+        f.external = not f.inline and rng.random() < 0.15
+        f.always, f.cannot, f.taken = (rng.random() < p for p in (0.12, 0.08, 0.1))
+        graph.append(f)
+        for _ in range(rng.choice((0, 0, 1, 1, 2, 3)) if i or cyclic else 0):
+            callee = rng.randrange(count if cyclic and rng.random() < 0.2 else max(i, 1))
+            f.calls.append(Call(callee, rng.choice(WISHES)))
+        f.fill(rng.choice(SIZES))
+    main, reached = Function("main", 0, external=True), set()
+
+    def reach(i):
+        if i not in reached:
+            reached.add(i)
+            for call in graph[i].calls:
+                reach(call.callee)
+
+    for i in reversed(range(count)):
+        if i not in reached or rng.random() < 0.3:
+            main.calls += [Call(i, rng.choice(WISHES)) for _ in range(rng.randint(1, 2))]
+            reach(i)
+    return graph + [main]
+
+
+def source_of(graph):
+    lines = ["volatile int port;"]
+    lines += [f"#pragma {name}({f.name})" for f in graph for name, wish in
+              (("FUNC_ALWAYS_INLINE", f.always), ("FUNC_CANNOT_INLINE", f.cannot)) if wish]
+    head = lambda f: ("" if f.external else "static ") + ("inline " if f.inline else "") + f"void {f.name}(int a)"
+    lines += [head(f) + ";" for f in graph[:-1]]
+    taken = [f.name for f in graph if f.taken]
+    lines += [f"void (*const table[])(int) = {{{', '.join(taken)}}};"] if taken else []
+    for f in graph:
+        lines.append("int main(void) {" if f.name == "main" else head(f) + " {")
+        for call in f.calls:
+            lines += [f"#pragma {call.pragma}"] if call.pragma else []
+            lines.append(f"    {graph[call.callee].name}({'7' if f.name == 'main' else 'a'});")
+            call.line = len(lines)
+        lines += ["    port = a;"] * f.stores + ["    port = 1;"] * f.odd + (["    return 0;"] if f.name == "main" else []) + ["}"]
+    return "\n".join(lines) + "\n"
+
+
+class Prediction:
+    """The rules by size, as they are meant."""
+
+    def __init__(self, graph, level, auto, disabled=False, single=False):
+        self.graph, self.level, self.disabled, self.single = graph, level, disabled, single
+        self.auto = auto if auto is not None else 20 if level >= 3 else 0
+        self.main = len(graph) - 1
+        everyone = range(len(graph))
+        self.root = [f.external or f.taken for f in graph]  # the rest of the program is not known
+        self.callers = [sum(c.callee == i for f in graph for c in f.calls) + (self.root[i] + graph[i].taken) for i in everyone]
+        self.order = self.number()
+        self.follows = {c.callee for i in everyone for c in graph[i].calls if self.order[i] >= self.order[c.callee]}
+        self.kept = {i for i, f in enumerate(graph) if self.root[i] or f.cannot or not (level > 2 or f.inline)}
+        self.left, self.inlined, self.accepted, self.suppressed = list(self.callers), set(), {}, set()
+        self.decide()
+        self.integrate()
+
+    def number(self):
+        """Reverse postorder from the roots; the callee that was met last comes first."""
+        def callees(i):
+            return list(dict.fromkeys(c.callee for c in self.graph[i].calls))[::-1]
+
+        roots = sorted((i for i in range(len(self.graph)) if self.root[i]), key=lambda i: "_" + self.graph[i].name)
+        finished, seen = [], set()
+
+        def visit(i):
+            if i not in seen:
+                seen.add(i)
+                for j in callees(i):
+                    visit(j)
+                finished.append(i)
+
+        for i in reversed(roots):
+            visit(i)
+        return {i: n for n, i in enumerate(reversed(finished), 1)}
+
+    def recursive_size(self, i, count):
+        if i in self.follows or self.graph[i].cannot:
+            return 0
+        calls = [c.callee for c in self.graph[i].calls]
+        below = sum(self.recursive_size(j, calls.count(j)) for j in sorted(set(calls)) if j != i)
+        return (self.graph[i].size + below) * count
+
+    def forced(self, call):
+        return call.pragma != NEVER and (call.pragma in (FORCED, DEEP) or self.graph[call.callee].always)
+
+    def is_candidate(self, i, call):
+        j, f = call.callee, self.graph[call.callee]
+        if call.pragma == NEVER or f.cannot or (j in self.follows and self.order[i] >= self.order[j]):
+            return False
+        if self.forced(call):
+            return True
+        if self.disabled or (j in self.follows and not f.inline):
+            return False
+        only = self.callers[j] == 1 and not self.root[j] and self.auto > 0
+        return f.inline or (self.level >= 3 and (f.size < self.auto or only))
+
+    def is_worth_it(self, j):
+        f, used = self.graph[j], self.root[j] or j in self.follows
+        last = self.single and self.left[j] == 1 and j not in self.kept
+        if self.auto == 0:
+            return last
+        called = {c.callee for c in f.calls}
+        size = f.size + sum(self.graph[k].size for k in called if k in self.inlined)
+        if f.always or (size < 21 and len(called) <= 1):
+            return True
+        if size <= 99 and (self.level >= 3 or f.inline) and not f.external and j not in self.kept and not used and \
+                self.callers[j] == 1:
+            return True
+        return (self.callers[j] + used) * size <= self.auto or last
+
+    def decide(self):
+        sites = [(i, call) for i in sorted(self.order, key=self.order.get) for call in reversed(self.graph[i].calls)
+                 if self.is_candidate(i, call)]
+        sites.sort(key=lambda site: -self.order[site[1].callee])
+        for predicate in (self.forced,
+                          lambda c: self.graph[c.callee].inline and self.recursive_size(c.callee, 1) < 2000,
+                          lambda c: self.is_worth_it(c.callee)):
+            for i, call in sites:
+                if call.line not in self.accepted and predicate(call):
+                    self.accepted[call.line] = call
+                    self.inlined.add(call.callee)
+                    self.left[call.callee] -= 1
+                    if self.left[call.callee] == 0 and call.callee not in self.kept:
+                        self.suppressed.add(call.callee)
+
+    def integrate(self):
+        saved, work = set(self.inlined), [c.callee for c in self.accepted.values() if self.forced(c) and c.pragma == DEEP]
+        seen = set(work)
+        while work:
+            below = {c.callee for c in self.graph[work.pop()].calls} - seen
+            seen |= below
+            work += sorted(below)
+            saved |= {j for j in below if not self.graph[j].cannot}
+        self.calls_left = {}
+
+        def expand(i, depth, deep, left):
+            for call in self.graph[i].calls:
+                chosen = call.line in self.accepted
+                if call.callee in saved and (chosen or deep) and depth < DEPTH_LIMIT:
+                    expand(call.callee, depth + 1, deep or (chosen and call.pragma == DEEP), left)
+                else:
+                    left.add(self.graph[call.callee].name)
+
+        waiting = [i for i in self.order if i not in self.suppressed]
+        for i in waiting:  # grows
+            left = self.calls_left[self.graph[i].name] = set()
+            expand(i, 0, False, left)
+            waiting += [j for j in self.order if self.graph[j].name in left and j not in waiting]
+
+
+class Choice(unittest.TestCase):
+    def setUp(self):
+        self.tools = Tools(**{name: os.environ.get(name.upper()) for name in ("zopt", "icrun", "icdump", "icparse")})
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.folder = Path(folder.name)
+
+    def check(self, graph, unit, words, prediction):
+        out, info = self.folder / "out.if", self.folder / "out.nfo"
+        self.tools.optimize(unit, out, [*words, "--debug:validate,inline_commentary", "--print_debug=1",
+                                        "--gen_opt_info=2", f"--opt_info_filename={info}"])
+        text, dump = info.read_text(), self.tools.dump(out)
+        accepted = {int(line) for line in re.findall(r"^\[accepted:  call from \S+ \(\S+:(\d+)\)", text, re.M)}
+        self.assertEqual(accepted, set(prediction.accepted))
+        for name, size in re.findall(r"^\[accepted: .*\) to _(\w+).* \(size (\d+) sites", text, re.M):
+            self.assertEqual(int(size), next(f.size for f in graph if f.name == name), name)
+        bodies = {name: set(re.findall(r"\b_(\w+)\(", body)) for name, body in
+                  re.findall(r"^function _(\w+):(.*?)^ +end function", dump, re.M | re.S)}
+        self.assertEqual(bodies, prediction.calls_left)
+        return out
+
+    def test_random_call_graphs(self):
+        for seed in range(30):
+            rng = random.Random(seed)
+            cyclic = seed % 3 == 0
+            graph = random_graph(rng, cyclic)
+            source, unit = self.folder / "graph.c", self.folder / "graph.if"
+            source.write_text(source_of(graph))
+            self.tools.parse(source, unit)
+            others = ((2, 60, False, True), (3, 30, False, False), (3, None, True, False), (3, 5, False, True))
+            for level, auto, disabled, single in ((2, None, False, False), (3, None, False, False), others[seed % 4]):
+                words = [f"--opt_level={level}"] + [f"--auto_inline={auto}"] * (auto is not None) + \
+                    ["--disable_inlining"] * disabled + ["--single_inline"] * single
+                with self.subTest(seed=seed, words=words):
+                    out = self.check(graph, unit, words, Prediction(graph, level, auto, disabled, single))
+                    if not cyclic and level == 3:
+                        self.assertEqual(self.tools.execute(out).status, 0)
+
+    def test_each_strategy(self):
+        tight = ",inline_static_limit=101,inline_small_limit=1"
+        for program in ("inlining", "inlining_forced"):
+            unit, out, info = (self.folder / f"{program}.{kind}" for kind in ("if", "out.if", "nfo"))
+            self.tools.parse(Path(__file__).parent / f"{program}.c", unit)
+            before = self.tools.execute(unit)
+            for strategy, limits in itertools.product(range(1, 6), ("", tight)):
+                with self.subTest(program=program, strategy=strategy, limits=limits):
+                    self.tools.optimize(unit, out, ["--opt_level=3", "--gen_opt_info=2", f"--opt_info_filename={info}",
+                                                    f"--debug:validate,inline_commentary,inliner={strategy}{limits}"])
+                    self.assertIsNone(difference(before, self.tools.execute(out)))
+                    if limits and strategy > 2:  # what was undone is checked by the optimizer itself
+                        self.assertIn("too big", info.read_text())
+
+
+if __name__ == "__main__":
+    unittest.main()

@@ -6,7 +6,7 @@
 
 int g = 5, h, runs;
 volatile int port;
-int (*through)(void);
+int (*through)(void), (*pick)(int, int);
 
 // COUNT 0: function _s_
 // A parameter that is written through its address is no constant.
@@ -18,6 +18,7 @@ static int counter(void) { static int n; return ++n; }
 // Each argument is evaluated once, and ahead of the body.
 static int s_unused_argument(int a, int b) { return b + 1; }
 static int moves_on(void) { return g += 50; }
+static int second(int a, int b) { return a ? b : a; }
 static int effect(void) { return ++runs; }
 static int s_twice(int a) { return a * a + a; }
 static int s_sees_value(int a) { g = 100; return a + g; }
@@ -125,9 +126,9 @@ int main(void) {
     x > 9999 ? s_void_too(1) : s_void_too(2);
     put_i32((s_void_too(7), g) + (x++, s_int(x)));
     put_i32((effect(), effect(), s_marks(0)));
-    through = moves_on;
-    put_i32(varying((through(), s_int(g)), 1));
-    put_i32(varying((through(), x && s_int(g) > 99), 1));
+    through = moves_on, pick = second;
+    put_i32(pick(1, (through(), s_int(g))));
+    put_i32(pick(1, (through(), x && s_int(g) > 99)));
     put_i32(runs);
     if (s_marks(2) && s_marks(4)) put_i32(1);
     switch (s_marks(2) + s_marks(8)) {

@@ -115,11 +115,11 @@ public:
 
     void run() {
         const std::vector<MENTION> mentions = by_bit();
-        auto m = mentions.begin();
+        const MENTION *m = mentions.data(), *end = m + mentions.size();
         for (size_t bit = 0; bit < count; ++bit) {
-            const auto first = m;
-            while (m != mentions.end() && m->bit == bit) ++m;
-            spread(&*first, static_cast<size_t>(m - first));
+            const MENTION* first = m;
+            while (m != end && m->bit == bit) ++m;
+            spread(first, static_cast<size_t>(m - first));
         }
         make_lists();
     }

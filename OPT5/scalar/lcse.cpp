@@ -125,6 +125,10 @@ int weight_of(const NODE* t) {
     return t->op == UMULT || t->op == STREF ? 2 : 1;
 }
 
+bool is_assignment_of_private_name(const NODE* t) {
+    return (t->op == ASG || is_operator_assignment(t)) && is_private_name(t->left) && !tree_has_side_effects(t->right);
+}
+
 // ---- The numbers of a chain
 
 // A load whose place has not changed since.
@@ -132,7 +136,19 @@ struct LOAD {
     KEY key;
     NODE* lvalue; // a copy
     VALUE value;
+    uint64_t names; // those that it mentions, by `mark_of`
 };
+
+// Symbols of different marks are different.
+uint64_t mark_of(const SYMTAB* sym) { return uint64_t{1} << (static_cast<uint64_t>(sym->index) & 63); }
+
+uint64_t marks_in(const NODE* t) {
+    uint64_t marks = 0;
+    for_each_subtree(t, [&marks](const NODE* n) {
+        if (n->op == NAME && n->u.sym) marks |= mark_of(n->u.sym);
+    });
+    return marks;
+}
 
 class NUMBERS {
 public:
@@ -166,7 +182,10 @@ public:
     // What evaluating `t` changes has no known value any more.
     void forget_changed(const NODE* t) {
         for_each_written_name(t, [this](const NODE* name, const NODE*) { variables[name->u.sym] = fresh(); });
-        auto gone = [t](const LOAD& l) {
+        // A variable that only its name reaches matters to the loads that mention it.
+        const uint64_t mark = is_assignment_of_private_name(t) ? mark_of(t->left->u.sym) : 0;
+        auto gone = [t, mark](const LOAD& l) {
+            if (mark && !(l.names & mark)) return false;
             if (!tree_modifies_lvalue_in_tree(t, l.lvalue)) return false;
             erase_tree(l.lvalue);
             return true;
@@ -197,7 +216,7 @@ private:
             erase_tree(loads.front().lvalue);
             loads.erase(loads.begin());
         }
-        loads.push_back({key, copy_tree(lvalue), v});
+        loads.push_back({key, copy_tree(lvalue), v, marks_in(lvalue)});
     }
     void forget_loads() {
         for (const LOAD& l : loads) erase_tree(l.lvalue);

@@ -192,8 +192,8 @@ void insert_stmt_before_stmt_in_bb(NODE* stmt, LIST* before, BBLK* bb, PSN* psn)
     *link = mkelist(stmt, *link, psn);
 }
 
-void promote_toplevel_COMMAOPs_in_list(LIST* list) {
-    for (; list; list = list->rest)
+void promote_toplevel_COMMAOPs_in_list(LIST* list, const LIST* end) {
+    for (; list != end; list = list->rest)
         while (list->first && list->first->op == COMMAOP) {
             NODE* comma = list->first;
             list->rest = mkelist(comma->right, list->rest, list->psn);

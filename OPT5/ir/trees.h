@@ -41,7 +41,7 @@ NODE* opASG_to_ASG(NODE* tree);
 // `x op= e` computes in `wanted`, the type of `x op e`.
 bool compound_ASG_computes_in(TYPE* wanted, int op, const NODE* x, const NODE* e);
 void insert_stmt_before_stmt_in_bb(NODE* stmt, LIST* before, BBLK* bb, PSN* psn);
-void promote_toplevel_COMMAOPs_in_list(LIST* list);
+void promote_toplevel_COMMAOPs_in_list(LIST* list, const LIST* end = nullptr); // up to the cell `end`
 
 // ---- Calls
 int arg_list_count(const NODE* list);

@@ -493,7 +493,7 @@ void EXPANSION::run() {
             s->first = expand(s->first, false);
             if (!found) continue;
             s->first = simp_tree(s->first, nullptr);
-            promote_toplevel_COMMAOPs_in_list(s);
+            promote_toplevel_COMMAOPs_in_list(s, s->rest);
         }
     sym_split(currfuninfo);
     // A field may be set before the others have any value.

@@ -360,7 +360,7 @@ bool SWEEP::rewrite_statement(LIST* s) {
     if (!tree_is_ASM_comment(s->first)) s->first = peel_for_effect(simp_tree(s->first, nullptr));
     if (!s->first) return true;
     if (!was_decided && is_decided(s->first)) decided_a_branch = true;
-    promote_toplevel_COMMAOPs_in_list(s);
+    promote_toplevel_COMMAOPs_in_list(s, s->rest);
     return false;
 }
 

@@ -83,6 +83,16 @@ bool is_promise(const NODE* t) {
     return t->op == PPRAGMA && (t->pragma->kind == PRG_MUST_ITERATE || t->pragma->kind == PRG_PROB_ITERATE);
 }
 
+// The link of the block's last cell.
+LIST** drop_promises_from(LIST** link) {
+    while (*link && (*link)->rest)
+        if (is_promise((*link)->first))
+            drop_statement(link);
+        else
+            link = &(*link)->rest;
+    return link;
+}
+
 // A loop that has nothing but its test left, which stood on top, evaluates that once more than it has iterations: a
 // pragma in front of it promised something of the iterations, and a reader would take it for the tests.
 void drop_promises_of(BBLK* loop) {
@@ -232,7 +242,9 @@ private:
 
     bool take_over_successors(BBLK* bb) {
         bool changed = false;
+        LIST** link = &bb->statements; // of the first cell that may be a promise
         while (BBLK* next = mergeable_successor(bb)) {
+            link = drop_promises_from(link); // `next` heads no loop
             take_over(bb, next);
             changed = true;
         }
@@ -250,7 +262,6 @@ private:
 
     // The BRANCH's cell becomes the first of the successor's statements.
     void take_over(BBLK* bb, BBLK* next) {
-        drop_promises_in(bb); // `next` heads no loop
         LIST* cell = control_of(bb);
         LIST* first = next->statements;
         erase_tree(cell->first);
@@ -281,13 +292,7 @@ private:
 
 } // namespace
 
-void drop_promises_in(BBLK* bb) {
-    for (LIST** link = &bb->statements; *link && (*link)->rest;)
-        if (is_promise((*link)->first))
-            drop_statement(link);
-        else
-            link = &(*link)->rest;
-}
+void drop_promises_in(BBLK* bb) { drop_promises_from(&bb->statements); }
 
 void make_branch(BBLK* bb, LIST* control, BBLK* target) {
     NODE* tree = control->first;

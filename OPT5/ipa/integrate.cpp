@@ -102,7 +102,7 @@ bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
     FUNINFO* callee = find_FUNINFO_for_call(call);
     if (!callee || !callee->symbol || !callee->saved_cfg) return false;
     const bool is_wanted = is_chosen(call->call) || (deep && arguments_fit_parameters(call, callee->symbol));
-    if (!is_wanted || currfuninfo->has_eh()) {
+    if (!is_wanted || currfuninfo->has_eh() || find_pragma(currfunc, PRG_FUNC_SYNONYM)) {
         unsuppress_inline_function(callee);
         left_alone.insert(call);
         return false;

@@ -139,6 +139,8 @@ void run_workers() {
 
 // ---- From barrier to barrier
 
+bool is_written(SYMTAB* f) { return TEST_FLAG(make_FUNINFO(f), FUN_is_processed); }
+
 bool work_remains() {
     return std::any_of(functions.begin(), functions.end(), [](SYMTAB* f) { return !steps_table[f].empty(); });
 }
@@ -150,7 +152,12 @@ void advance_to_barrier() {
                            [](SYMTAB* f) { return !at_barrier_or_end(steps_table[f]); })) {
         run_workers();
     }
-    for (SYMTAB* f : unsuppressed_functions) run_until_barrier(f, steps_table[f]);
+    for (SYMTAB* f : unsuppressed_functions) {
+        PASS_LIST& passes = steps_table[f];
+        const bool is_behind_its_end = passes.empty() && max_threads == 0; // it came there suppressed, or came back before
+        if (is_behind_its_end && !is_written(f)) passes.push_back(output_step);
+        run_until_barrier(f, passes);
+    }
     functions.splice(functions.end(), unsuppressed_functions);
     currfunc = nullptr;
     currfuninfo = nullptr;
@@ -197,7 +204,8 @@ void write_buffered_functions() {
 void finish_late_functions() {
     for (SYMTAB* f : unsuppressed_functions) {
         PASS_LIST& passes = steps_table[f];
-        if (std::find(passes.begin(), passes.end(), output_step) == passes.end()) passes.push_back(output_step);
+        const bool will_be = std::find(passes.begin(), passes.end(), output_step) != passes.end();
+        if (!will_be && !is_written(f)) passes.push_back(output_step);
         passes.remove_if([](const pass* p) { return p->is_barrier(); });
         run_until_barrier(f, passes);
     }

@@ -61,10 +61,14 @@ const ROW rows[] = {
 
 ROWS rows_ahead_of_output() { return rows; }
 
+// One that is suppressed and still in work, as in an order of steps that lacks the one that takes it out, keeps its body: a
+// call that is written later may bring it back.
 void output_function() {
-    run_rows_ahead_of_output();
-    if (is_written()) write_function();
-    erase_all();
+    if (is_written()) {
+        run_rows_ahead_of_output();
+        write_function();
+        erase_all();
+    }
     currfuninfo = nullptr;
     currfunc = nullptr;
     restore_global_flags();

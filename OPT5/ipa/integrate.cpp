@@ -38,6 +38,8 @@
 namespace {
 
 constexpr long DEFAULT_DEPTH_LIMIT = 10;
+// Units of size that calls which came with expansions add to a function: three a function would be 3^10 at that depth.
+constexpr long MOST_NESTED = 4000, MOST_FORCED_DEEP = 100000;
 
 long depth_limit() {
     const auto option = option_obj::OO_inline_recursion_limit;
@@ -92,7 +94,7 @@ private:
 
     std::unordered_set<const NODE*> left_alone; // calls; membership only
     const PSN* current_psn = nullptr;
-    long expansions = 0;
+    long expansions = 0, nested = 0;
 };
 
 // ---- Which calls
@@ -103,6 +105,11 @@ bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
     if (!callee || !callee->symbol || !callee->saved_cfg) return false;
     const bool is_wanted = is_chosen(call->call) || (deep && arguments_fit_parameters(call, callee->symbol));
     if (!is_wanted || currfuninfo->has_eh() || find_pragma(currfunc, PRG_FUNC_SYNONYM)) {
+        unsuppress_inline_function(callee);
+        left_alone.insert(call);
+        return false;
+    }
+    if (call->call && call->call->inline_depth > 0 && nested >= (deep ? MOST_FORCED_DEEP : MOST_NESTED)) {
         unsuppress_inline_function(callee);
         left_alone.insert(call);
         return false;
@@ -403,6 +410,7 @@ BBLK* INTEGRATION::expand(BBLK* bb, LIST* cell, NODE** slot) {
         debug_printf("\n\t>>>>> (%ld) Integrating procedure %s() <<<<<\n", cell->psn ? cell->psn->line : 0L,
                      callee->name.c_str());
     ++expansions;
+    if (call->call && call->call->inline_depth > 0) nested += callee->size;
 
     // Where the result goes.
     const bool is_statement = statement == call;

@@ -15,7 +15,7 @@ from pathlib import Path
 
 from run import Tools, difference
 
-DEPTH_LIMIT = 10
+DEPTH_LIMIT, MOST_NESTED, MOST_FORCED_DEEP = 10, 4000, 100000
 FORCED, DEEP, NEVER = "FORCEINLINE", "FORCEINLINE_RECURSIVE", "NOINLINE"
 WISHES = ("",) * 12 + (FORCED, DEEP, NEVER)
 SIZES = (5, 6, 9, 10, 11, 19, 20, 20, 21, 21, 60, 98, 99, 100, 101, 300)  # about the limits of the rules
@@ -194,17 +194,22 @@ class Prediction:
             saved |= {j for j in below if not self.graph[j].cannot}
         self.calls_left = {}
 
+        nested = 0  # units of size of what came with expansions
+
         def expand(i, depth, deep, left):
+            nonlocal nested
             for call in self.graph[i].calls:
                 chosen = call.line in self.accepted
-                if call.callee in saved and (chosen or deep) and depth < DEPTH_LIMIT:
+                fits = depth == 0 or nested < (MOST_FORCED_DEEP if deep else MOST_NESTED)
+                if call.callee in saved and (chosen or deep) and depth < DEPTH_LIMIT and fits:
+                    nested += self.graph[call.callee].size if depth else 0
                     expand(call.callee, depth + 1, deep or (chosen and call.pragma == DEEP), left)
                 else:
                     left.add(self.graph[call.callee].name)
 
         waiting = [i for i in self.order if i not in self.suppressed]
         for i in waiting:  # grows
-            left = self.calls_left[self.graph[i].name] = set()
+            left, nested = self.calls_left.setdefault(self.graph[i].name, set()), 0
             expand(i, 0, False, left)
             waiting += [j for j in self.order if self.graph[j].name in left and j not in waiting]
 
@@ -260,6 +265,27 @@ class Choice(unittest.TestCase):
                     self.assertIsNone(difference(before, self.tools.execute(out)))
                     if limits and strategy > 2:  # what was undone is checked by the optimizer itself
                         self.assertIn("too big", info.read_text())
+
+    def test_orders_without_the_step_that_takes_suppressed_functions_out(self):
+        unit, out = self.folder / "inlining.if", self.folder / "inlining.out.if"
+        self.tools.parse(Path(__file__).parent / "inlining.c", unit)
+        before = self.tools.execute(unit)
+        for words in (["--opt_passes=6"], ["--opt_passes=11,6"], ["--debug:only=auto-inline-call-sites"],
+                      ["--debug:skip=set-call-graph-order"], ["--debug:skip=pass-2-inits"]):
+            with self.subTest(words=words):
+                self.tools.optimize(unit, out, ["--opt_level=3", *words])
+                self.assertIsNone(difference(before, self.tools.execute(out)))
+
+    def test_calls_that_multiply_are_expanded_within_bounds(self):
+        """Each function calls the next three times: to the depth that is allowed these are 3^10 bodies."""
+        source, unit, out = (self.folder / name for name in ("deep.c", "deep.if", "deep.out.if"))
+        source.write_text("static inline int f40(int x) { return x + 1; }\n" + "".join(
+            f"static inline int f{i}(int x) {{ return x < 0 ? x : {' + '.join(f'f{i + 1}(x - {k})' for k in (7, 8, 9))}; }}\n"
+            for i in reversed(range(40))) + "int main(void) { return f0(5) & 127; }\n")
+        self.tools.parse(source, unit)
+        self.tools.optimize(unit, out, ["--opt_level=3"])
+        self.assertLess(out.stat().st_size, 4_000_000)
+        self.assertIsNone(difference(self.tools.execute(unit), self.tools.execute(out)))
 
 
 if __name__ == "__main__":

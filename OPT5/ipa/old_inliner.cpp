@@ -16,13 +16,13 @@ bool is_seen_from_outside(const FUNINFO* f) {
     return (f->symbol->sclass == SC_EXTDEF || f->symbol->sclass == SC_EXTERN) && !no_outside_callers;
 }
 
-// What expanding everything below the function would make of it. A sum beyond the limit is not followed further.
+// What expanding everything below the function would make of it, or `limit` if that is no more than it would be.
 int64_t recursive_size(FUNINFO* f, int64_t ncalls, int64_t limit) {
     if (TEST_FLAG(f, FUN_follows_call | FUN_cannot_inline) || f->size == 0) return 0;
     int64_t sum = f->size;
     for (const CALLEE* c = f->callees; c && sum * ncalls < limit; c = c->next)
         if (c->callee != f) sum += recursive_size(c->callee, c->ncalls, limit - sum);
-    return sum * ncalls;
+    return std::min(sum * ncalls, limit);
 }
 
 uint32_t size_with_expansions(const FUNINFO* f) {

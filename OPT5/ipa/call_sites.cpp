@@ -104,7 +104,7 @@ private:
         }
     }
 
-    // Whether forcing goes on into the call's arguments.
+    // Whether the call's arguments are forced, too.
     bool enter(const NODE* call, int request, bool deep) {
         file.owned.push_back(std::make_unique<CALLSITE>());
         CALLSITE& site = *file.owned.back();

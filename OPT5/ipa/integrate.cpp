@@ -170,7 +170,7 @@ void INTEGRATION::walk(BBLK* bb, const BBLK* end, bool deep) {
 // The statement begins the block that is returned.
 BBLK* INTEGRATION::split_ahead(BBLK* bb, LIST* cell) {
     LIST* before = bb->statements;
-    if (before == cell) { // the empty statement that it is split behind goes again
+    if (before == cell) { // the empty statement that it is split behind is removed again
         insert_before(&bb->statements, nullptr, cell->psn);
         BBLK* next = split_block(bb, bb->statements, false);
         drop_statement(&bb->statements);
@@ -190,8 +190,8 @@ void INTEGRATION::put_first_ahead(BBLK* bb, LIST* cell, NODE** comma) {
     erase_node(t);
 }
 
-// `c ? a : b`, `c && a` or `c || b` inside a statement: a temporary that blocks ahead of it set. Returns the block that
-// the walk goes on with, which tests c.
+// `c ? a : b`, `c && a` or `c || b` inside a statement: a temporary that blocks ahead of it set. Returns the block
+// that tests c, where the walk continues.
 BBLK* INTEGRATION::separate(BBLK* bb, LIST* cell, NODE** condition) {
     NODE* t = *condition;
     TYPE* type = t->type->stqs();
@@ -412,7 +412,7 @@ BBLK* INTEGRATION::expand(BBLK* bb, LIST* cell, NODE** slot) {
     ++expansions;
     if (call->call && call->call->inline_depth > 0) nested += callee->size;
 
-    // Where the result goes.
+    // What takes the result.
     const bool is_statement = statement == call;
     const bool is_plain = (statement->op == ASG || statement->op == STASG) && slot == &statement->right &&
                           statement->left->op == NAME && !lvalue_is_volatile(statement->left) &&

@@ -132,6 +132,18 @@ BBLK* insert_new_bb_with_branch(int uon, BBLK* after, BBLK* target, PSN* psn) {
     return bb;
 }
 
+void set_text_order(const std::vector<BBLK*>& order) {
+    BBLK* last = nullptr;
+    for (BBLK* bb : order) {
+        if (last) last->dflink = bb;
+        bb->rdflink = last;
+        last = bb;
+    }
+    last->dflink = nullptr;
+    order.front()->rdflink = last;
+    graph_was_changed(currfuninfo);
+}
+
 void delink_old_bb(BBLK* bb) {
     FUNINFO* f = bb->owner();
     if (f->bb_list == bb)

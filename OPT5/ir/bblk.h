@@ -61,6 +61,8 @@ void renumber_bblocks();
 BBLK* mkbblock(LIST* list, BBLK* next, FUNINFO* funinfo);
 BBLK* insert_new_bb(int uon, BBLK* after, LIST* list);
 BBLK* insert_new_bb_with_branch(int uon, BBLK* after, BBLK* target, PSN* psn);
+// All blocks of the current function, the entry first, follow each other in this order; their numbers are stale then.
+void set_text_order(const std::vector<BBLK*>& order);
 void delink_old_bb(BBLK* bb);
 void erase_bblock(BBLK* bb); // its statements, labels and edges; the object stays
 

@@ -148,7 +148,7 @@ public:
     std::unique_ptr<NATURAL_LOOPS> loops;
     std::unique_ptr<LIVE_SETS> live_sets;
     // A private copy of the body for call integration, made before pass 2 and never worked on: a record of its own, which is
-    // on no list. It stays when the body goes.
+    // on no list. It stays when the body is erased.
     std::unique_ptr<FUNINFO> saved_cfg;
     long temp_counter = 0;
     SYMTAB* ret_by_cctor_sym = nullptr;

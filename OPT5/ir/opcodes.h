@@ -39,6 +39,25 @@ constexpr bool op_is_float_compare(int op) { return op >= FEQ && op <= FUNO; }
 constexpr bool op_is_int_compare(int op) { return op >= EQ && op <= UGT; }
 constexpr bool op_is_call(int op) { return op == CALL || op == UCALL; }
 constexpr bool op_is_intrinsic(int op) { return op == ICALL || op == UICALL || op == MCALL || op == UMCALL; }
+// Arithmetic on the values of one or two operands: sums, products, quotients, bits, shifts, and what takes one number.
+constexpr bool op_is_arithmetic(int op) {
+    switch (op) {
+    case PLUS:
+    case MINUS:
+    case MULT:
+    case DIV:
+    case MOD:
+    case ANDB:
+    case ORB:
+    case XORB:
+    case SLL:
+    case SRL:
+    case UMINUS:
+    case NOTB:
+    case ABS: return true;
+    default: return false;
+    }
+}
 // Assignment operators: plain, structure, array and compound, increments included.
 bool opcode_is_ASG(int op);
 // A printable name; "OP#n" in a static buffer for a gap.

@@ -179,6 +179,16 @@ void erase_tree(NODE* t) {
     }
 }
 
+NODE* taken_out_of_members(NODE* place) {
+    while (place->op == STDOT) {
+        NODE* below = place->left;
+        erase_tree(place->right);
+        erase_node(place);
+        place = below;
+    }
+    return place;
+}
+
 void erase_tree_list_to_entry(LIST* list, LIST* entry) {
     while (list && list != entry) {
         LIST* rest = list->rest;

@@ -123,6 +123,7 @@ LIST* copy_dd_statements(const LIST* list, bool keep_scope = true);
 // then.
 void erase_tree(NODE* t);
 void erase_node(NODE* t);              // one node with what it owns, not its operands
+NODE* taken_out_of_members(NODE* place); // the object below the STDOTs of a place, which are erased
 void erase_tree_list(LIST* list);      // trees and cells
 void erase_tree_list_only(LIST* list); // cells
 void erase_tree_list_to_entry(LIST* list, LIST* entry);

@@ -95,6 +95,13 @@ N* without_members(N* t) {
     return t;
 }
 
+// The same where the members are first ones, no bit-fields: the place begins where what is returned does.
+template <class N>
+N* without_first_members(N* t) {
+    while (t->op == STDOT && t->right->mval && t->right->mval->offset == 0 && !t->right->mval->is_bitfld) t = t->left;
+    return t;
+}
+
 // The same; `*offset` grows by where the members lie in what is returned, in bits.
 template <class N>
 N* without_members(N* t, int64_t* offset) {

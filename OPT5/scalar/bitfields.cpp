@@ -187,7 +187,7 @@ bool is_scalar_member(const NODE* t) {
            t->type->size == normalized_value_type(t->right->mval->type)->size;
 }
 
-// A candidate that is named in any other way than by a member is none.
+// A candidate that is named by anything but a member is none.
 void EXPANSION::look_at(const NODE* t) {
     for (; t; t = t->left) {
         if (is_scalar_member(t)) {

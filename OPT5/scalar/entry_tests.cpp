@@ -136,7 +136,7 @@ NODE* with_value(NODE* tree, const SYMTAB* sym, const NODE* value) {
     return simp_tree(tree, nullptr);
 }
 
-// Trees as they are at some place in a tail, on the way back. Owned.
+// Trees as they are at some place in a tail, which is walked backward. Owned.
 class TAKEN_BACK {
 public:
     TAKEN_BACK(const TAIL& statements, size_t from, std::vector<NODE*> copies)
@@ -212,7 +212,7 @@ private:
         return changed;
     }
 
-    // Into a loop that its first test may leave: else there would be two ways in.
+    // Into a loop that its first test may leave: else it would have two entries.
     bool may_enter_at(const BBLK* before, const BBLK* bb, const NODE* test) const {
         const NATURAL_LOOP* loop = loops.around(bb);
         return !loop || loops.contains(loop, before) || !loops.contains(loop, target_of(test, false)) ||

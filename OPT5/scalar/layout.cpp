@@ -146,15 +146,7 @@ private:
         for (size_t i = 0; i < order.size(); ++i)
             for (const EDGE* e = order[i]->successors; e; e = e->rest) place(e->first);
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) place(bb);
-        BBLK* last = nullptr;
-        for (BBLK* bb : order) {
-            if (last) last->dflink = bb;
-            bb->rdflink = last;
-            last = bb;
-        }
-        last->dflink = nullptr;
-        order.front()->rdflink = last;
-        graph_was_changed(currfuninfo);
+        set_text_order(order);
     }
 
     // Of two targets that do not follow, the writer's conditional branch leads to the one that stands first in the

@@ -4,8 +4,8 @@
 // Detecting Equality of Variables in Programs, 1988; here over a chain of blocks, which needs no fixpoint). A tree whose
 // number a variable has is replaced by that variable. Otherwise its occurrences are remembered, and once they would save
 // more than an assignment costs, the first of them is kept in a temporary ahead of its statement. A store gives the place
-// the number of what is stored, so that a load behind it finds that; a place that a compound assignment wrote is found the
-// same way. What is assigned to a variable that has its number already is dropped.
+// the number of what is stored, so that a load behind it finds that; so does a compound
+// assignment. What is assigned to a variable that has its number already is dropped.
 //
 // Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph; symbols are split anew.
 // Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
@@ -94,26 +94,8 @@ struct KEY_HASH {
 uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); } // compared alone
 
 bool is_computed(int op) {
-    switch (op) {
-    case PLUS:
-    case MINUS:
-    case MULT:
-    case DIV:
-    case MOD:
-    case ANDB:
-    case ORB:
-    case XORB:
-    case SLL:
-    case SRL:
-    case UMINUS:
-    case NOTB:
-    case ABS:
-    case EXCLAIM:
-    case SCONV:
-    case PCONV:
-    case PMCONV: return true;
-    default: return op_is_int_compare(op) || op_is_float_compare(op);
-    }
+    if (op == EXCLAIM || op == SCONV || op == PCONV || op == PMCONV) return true;
+    return op_is_arithmetic(op) || op_is_int_compare(op) || op_is_float_compare(op);
 }
 
 bool is_free(int op) { return op == SCONV || op == PCONV || op == ISP2CHAR || op == COMMA; }
@@ -279,11 +261,8 @@ VALUE NUMBERS::of_operator(const NODE* t) {
 
 VALUE NUMBERS::of_address(const NODE* place) {
     int64_t offset = 0;
-    for (; place->op == STDOT; place = place->left) {
-        if (!place->right->mval || place->right->mval->is_bitfld) return fresh();
-        offset += place->right->mval->offset;
-    }
-    if (place->op == NAME && place->u.sym)
+    place = without_members(place, &offset);
+    if (place->op == NAME && place->u.sym && offset == static_cast<VALUE>(offset))
         return computed_as({UAND, 1, identity(place->u.sym), static_cast<VALUE>(offset), 0});
     return fresh();
 }
@@ -293,16 +272,10 @@ KEY NUMBERS::key_of_load(const NODE* t) {
     const KEY none{t->op, 0, 0, 0, 0};
     const unsigned code = code_of(t->type);
     if (!code || lvalue_is_volatile(t)) return none;
+    if ((t->op == STDOT || t->op == STREF) && t->right->mval->is_bitfld) return none;
     int64_t offset = 0;
-    const NODE* place = t;
-    for (; place->op == STDOT; place = place->left) {
-        if (!place->right->mval || place->right->mval->is_bitfld) return none;
-        offset += place->right->mval->offset;
-    }
-    if (place->op == STREF) {
-        if (!place->right->mval || place->right->mval->is_bitfld) return none;
-        offset += place->right->mval->offset;
-    }
+    const NODE* place = without_members(t, &offset);
+    if (place->op == STREF) offset += place->right->mval->offset;
     if (offset != static_cast<VALUE>(offset)) return none;
     const auto at = static_cast<VALUE>(offset);
     if (place->op == NAME && place->u.sym && !place->u.sym->is_function())

@@ -174,14 +174,7 @@ void lay_out(TRACES& traces) {
     for (const auto& trace : list) count += trace->contents.size();
     const std::vector<BBLK*> order = order_of(traces);
     if (order.size() != count) return;
-    BBLK* last = nullptr;
-    for (BBLK* bb : order) {
-        if (last) last->dflink = bb;
-        bb->rdflink = last;
-        last = bb;
-    }
-    last->dflink = nullptr;
-    entry->rdflink = last;
+    set_text_order(order);
 }
 
 } // namespace

@@ -7,6 +7,7 @@
 #include "OPT5/simp/compare.h"
 
 #include "OPT5/ir/symbol_maps.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/linear_value.h"
@@ -292,13 +293,6 @@ bool is_null(const NODE* t) {
     return is_icon(t, INT65(0));
 }
 
-// The place that a first member begins with.
-const NODE* place_of_first_member(const NODE* place) {
-    while (place->op == STDOT && place->right->mval && place->right->mval->offset == 0 && !is_bitfield_access(place))
-        place = place->left;
-    return place;
-}
-
 // What p is the address of, or the pointer that it is the value of, below casts and first members.
 struct ORIGIN {
     const NODE* node;
@@ -307,7 +301,7 @@ struct ORIGIN {
 
 ORIGIN origin_of(const NODE* p) {
     for (;;) {
-        const NODE* place = p->op == UAND ? place_of_first_member(p->left) : nullptr;
+        const NODE* place = p->op == UAND ? without_first_members(static_cast<const NODE*>(p->left)) : nullptr;
         if (place && place->op == NAME) return {place, true};
         const bool is_first_member = place && place->op == STREF && place->right->mval &&
                                      place->right->mval->offset == 0 && !is_bitfield_access(place);

@@ -1,4 +1,4 @@
-// From the text of a row to the patterns that the matcher goes by: one for each order of its commutative operators and
+// From the text of a row to the patterns that are matched: one for each order of its commutative operators and
 // for each relation that a sign for several stands for.
 
 #include "OPT5/simp/pattern_text.h"

@@ -21,14 +21,7 @@ NODE* peel_operands(NODE* t) {
 
 // The object whose address is taken isn't read; a pointer that leads to it is.
 NODE* peel_address(NODE* t) {
-    NODE* object = t->left;
-    while (object->op == STDOT) {
-        NODE* inner = object->left;
-        erase_tree(object->right);
-        erase_node(object);
-        object = inner;
-    }
-    t->left = object;
+    NODE* object = t->left = taken_out_of_members(t->left);
     if (object->op == UMULT || object->op == STREF) {
         t->left = object->left;
         if (object->right) erase_tree(object->right);
@@ -57,21 +50,8 @@ NODE* peel_logical(NODE* t) {
 
 // Operators that only compute.
 bool computes_only(int op) {
-    if (boolean_result[op]) return true;
+    if (boolean_result[op] || op_is_arithmetic(op)) return true;
     switch (op) {
-    case PLUS:
-    case MINUS:
-    case MULT:
-    case DIV:
-    case MOD:
-    case ANDB:
-    case ORB:
-    case XORB:
-    case SLL:
-    case SRL:
-    case UMINUS:
-    case NOTB:
-    case ABS:
     case SQRT:
     case SQR:
     case RECIP:

@@ -112,12 +112,7 @@ NODE* address_of_member(NODE* t) {
     NODE* base = without_members(t->left, &bits);
     const INT65 offset(bits >> 4);
     if (!offset_is_in_range(offset, t->type, 0) || (base->op != NAME && base->op != UMULT) || base->right) return t;
-    while (t->left != base) {
-        NODE* member = t->left;
-        t->left = member->left;
-        erase_tree(member->right);
-        erase_node(member);
-    }
+    t->left = taken_out_of_members(t->left);
     TYPE* type = t->type;
     t->type = tp->mk_ptr(base->type);
     NODE* address = coerce_to_type(type, base->op == UMULT ? address_of_indirection(t) : t);

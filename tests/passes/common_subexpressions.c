@@ -91,7 +91,7 @@ int again(int x, int y) {
     return r;
 }
 
-// `p + i` is no access by way of r.
+// `p + i` is not derived from r.
 int *taken(int *p) { return p; }
 // FUNCTION: restricted
 // COUNT 2: p + i

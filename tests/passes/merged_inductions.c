@@ -192,7 +192,7 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
     for (int i = 0; i < n; i++) y[i] = x[i] * x[i + 1];
 }
 
-// A pointer of an inner loop with a known trip count goes on from where that loop left it; not where it may be left early,
+// A pointer of an inner loop with a known trip count continues from where that loop left it; not where it may be left early,
 // where the outer counter steps ahead of it, or where the count is not known.
 // FUNCTION: nests
 // COUNT 6: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/

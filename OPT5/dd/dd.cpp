@@ -1,13 +1,6 @@
 // Not built yet: the passes leave the program as it is, and every question is answered with "not known".
 #include "OPT5/dd/dd.h"
 
-void build_loop_hierarchy(bool, bool, bool, bool) {}
-void unbuild_loop_hierarchy() {}
-void erase_loop_hierarchy() {}
-void reinsert_loop_pragmas() {}
-NODE* normalize_tree(NODE* tree, NODE*) { return tree; }
-NODE* denormalize_tree(NODE* tree, bool) { return tree; }
-void split_qualified_parameter_copies() {}
 void construct_SSA_form(bool, bool, bool) {}
 void deconstruct_SSA_form() {}
 void clone_SSA_NASSERTs() {}
@@ -19,10 +12,7 @@ void init_dependence_analysis() {}
 void wrapup_dependence_analysis(bool) {}
 void report_all_dependences() {}
 void report_ambiguous_aliases(struct LOOP*) {}
-void find_loop_assertions(struct LOOP*) {}
-bool sink_unused_definitions(struct LOOP*) { return false; }
 void undeltafy_dd_loops(struct LOOP*) {}
-void add_downcounters_to_loops(struct LOOP*, bool, bool) {}
 void collapse_dd_loops(struct LOOP*) {}
 void sr_circular_addressing_in_loop(struct LOOP*) {}
 void sr_DIV_and_MOD_in_loop(struct LOOP*, bool) {}
@@ -33,6 +23,4 @@ void interleave_reductions_in_loop(struct LOOP*, bool) {}
 void explode_local_arrays() {}
 void special_DMAC_conversion() {}
 void rotate_loops_for_accumulators() {}
-void do_dd_analysis_for_be() {}
-void finalize_dd_edges() {}
 void do_DVE_unit_testing() {}

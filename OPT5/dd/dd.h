@@ -1,14 +1,8 @@
-// Loops: hierarchy, dependence, SSA form, induction variables, and the transformations on them.
+// Loops: normal form, dependence, SSA form, and the transformations on loops. The hierarchy is in loop.h.
 #pragma once
 
 class NODE;
 struct LOOP; // written out where it is used: an opcode has the same name
-
-// The hierarchy's root is held by the first block, null without.
-void build_loop_hierarchy(bool full, bool ssa, bool scalars, bool pragmas);
-void unbuild_loop_hierarchy();
-void erase_loop_hierarchy();
-void reinsert_loop_pragmas();
 
 // The normal form that loop work runs on. Both consume the tree and return what it became.
 NODE* normalize_tree(NODE* tree, NODE* statement);
@@ -34,10 +28,8 @@ void report_all_dependences();
 void report_ambiguous_aliases(struct LOOP* loop);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
-void find_loop_assertions(struct LOOP* loop);
 bool sink_unused_definitions(struct LOOP* loop);
 void undeltafy_dd_loops(struct LOOP* loop);
-void add_downcounters_to_loops(struct LOOP* loop, bool recurse, bool all);
 void collapse_dd_loops(struct LOOP* loop);
 void sr_circular_addressing_in_loop(struct LOOP* loop);
 void sr_DIV_and_MOD_in_loop(struct LOOP* loop, bool recurse);

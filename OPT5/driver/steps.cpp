@@ -11,6 +11,7 @@
 #include "OPT5/cd/cd.h"
 #include "OPT5/cd/vectors.h"
 #include "OPT5/dd/dd.h"
+#include "OPT5/dd/loop.h"
 #include "OPT5/ipa/inline.h"
 #include "OPT5/ipa/ipcp.h"
 #include "OPT5/ipa/progana.h"
@@ -159,7 +160,7 @@ void with_hierarchy(F work) {
 }
 
 void drop_hierarchy_and_rebuild() {
-    reinsert_loop_pragmas();
+    reinsert_loop_pragmas(root());
     erase_loop_hierarchy();
     rebuildcfg();
 }

@@ -16,6 +16,7 @@
 #include "UTIL/abort.h"
 #include "UTIL/safemem.h"
 
+#include <atomic>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -53,6 +54,10 @@ void push(SYMTAB*& list, SYMTAB* sym) {
 
 } // namespace
 
+namespace {
+std::atomic<uint32_t> symbols_made{0};
+}
+SYMTAB::SYMTAB() : uid(++symbols_made) {}
 SYMTAB::~SYMTAB() {
     std::free(name);
     erase_pragma_list(pragma);

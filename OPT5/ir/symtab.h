@@ -71,6 +71,7 @@ class SYMTAB : public I_SYMTAB {
 public:
     // `index` and `retention` come from I_SYMTAB.
     char* name = nullptr; // linker-level, owned
+    uint32_t uid;         // in the order of making, over the whole run
     uint64_t size = 0;    // bits
     uint32_t value = 0;   // register of a class 4 or 22 symbol, otherwise as the I-file gave it
     int8_t sclass = 0;
@@ -105,7 +106,7 @@ public:
     bool hosts_others = false;
     NODE* size_tree = nullptr;
 
-    SYMTAB() = default;
+    SYMTAB();
     ~SYMTAB() override;
 
     const char* sym_name() const override { return name; }

@@ -98,6 +98,10 @@ LOOP_FACTS::LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all),
     estimate_trip_count();
 }
 
+LOOP_FACTS::~LOOP_FACTS() {
+    for (NODE* t : made) erase_tree(t);
+}
+
 // ---- What is assigned
 
 void LOOP_FACTS::collect_assignments() {
@@ -292,19 +296,33 @@ bool LOOP_FACTS::runs_once_in_each_iteration(const BBLK* bb) const {
     return loops.around(bb) == loop && loops.dominates_latches(bb, loop);
 }
 
+// An integer that is tested for truth, `counter` or `counter + constant`, against what it is compared with; null if it is none.
+const NODE* LOOP_FACTS::limit_of_truth(const NODE*& t) {
+    const bool is_sum = t->op == PLUS && t->right->op == ICON && t->type->is_int();
+    const NODE* counter = is_sum ? static_cast<const NODE*>(t->left) : t;
+    if (counter->op != NAME || !counter->type->is_int() || counter->type->size != t->type->size) return nullptr;
+    TYPE* type = counter->type->stqs();
+    const INT65 limit = is_sum ? truncate_to_type(-t->right->u.lval, type) : INT65(0);
+    t = counter;
+    return made.emplace_back(mk_ICON(limit, type));
+}
+
 void LOOP_FACTS::find_tests() {
     for (BBLK* bb : loop->blocks) {
         NODE* branch = bb->branch();
-        if (!branch || branch->op != IF || !op_is_int_compare(branch->left->op) || !runs_once_in_each_iteration(bb)) continue;
+        if (!branch || branch->op != IF || !runs_once_in_each_iteration(bb)) continue;
         const NODE* compare = branch->left;
         LOOP_TEST test;
         test.bb = bb;
         test.branch = branch;
-        test.stay_op = compare->op;
-        const NODE *counter = compare->left, *limit = compare->right;
+        const bool is_compare = op_is_int_compare(compare->op), is_negated = compare->op == EXCLAIM;
+        const NODE *counter = is_negated || is_compare ? static_cast<const NODE*>(compare->left) : compare;
+        const NODE* limit = is_compare ? static_cast<const NODE*>(compare->right) : limit_of_truth(counter);
+        if (!limit) continue;
+        test.stay_op = is_compare ? compare->op : is_negated ? static_cast<int>(EQ) : static_cast<int>(NEQ);
         if (counter->op != NAME || !is_induction(counter->u.sym)) {
             std::swap(counter, limit);
-            test.stay_op = commute_inv[compare->op];
+            test.stay_op = commute_inv[test.stay_op];
         }
         if (counter->op != NAME || !is_induction(counter->u.sym) || !is_invariant(limit)) continue;
         test.counter = induction(counter->u.sym);

@@ -35,7 +35,7 @@ struct LOOP_TEST {
     BBLK* bb = nullptr;
     NODE* branch = nullptr;       // the IF
     INDUCTION* counter = nullptr; // which has one step in each iteration, by a constant
-    const NODE* limit = nullptr;  // invariant
+    const NODE* limit = nullptr;  // invariant; of a test for truth, `counter` or `counter + constant`, made for it
     int stay_op = 0;              // control stays in the loop while `counter stay_op limit`
     bool stays_if_true = false;   // of the compare as it stands
     bool step_comes_first = false;
@@ -44,6 +44,9 @@ struct LOOP_TEST {
 class LOOP_FACTS final : public LINEAR_LEAVES {
 public:
     LOOP_FACTS(const NATURAL_LOOPS& all, NATURAL_LOOP* of);
+    ~LOOP_FACTS() override;
+    LOOP_FACTS(const LOOP_FACTS&) = delete;
+    LOOP_FACTS& operator=(const LOOP_FACTS&) = delete;
     // False for a loop that is better left alone: it holds what is not understood, or has another entry than its header.
     bool is_usable() const { return usable; }
     INDUCTION* induction(const SYMTAB* sym);
@@ -74,6 +77,7 @@ private:
     void keep_inductions();
     void order_steps();
     void find_starts();
+    const NODE* limit_of_truth(const NODE*& t);
     void find_tests();
     bool runs_once_in_each_iteration(const BBLK* bb) const;
     void judge_wrapping();
@@ -90,6 +94,7 @@ private:
     std::unordered_map<const SYMTAB*, int> names;
     std::unordered_map<const SYMTAB*, bool> unchanged; // other variables that were asked about
     std::vector<LOOP_TEST> exits;
+    std::vector<NODE*> made; // limits that the text does not name
     std::unordered_map<const SYMTAB*, DEFINITION> definitions; // the last seen
     std::unordered_map<const NODE*, int> place;                // of a statement in its block
     const BBLK* looking_in = nullptr;
@@ -102,6 +107,9 @@ private:
 // Makes two inductions one that are equal throughout the loop (equal_inductions.cpp); whether it found two. `facts` is then
 // stale.
 bool unite_equal_inductions(const NATURAL_LOOPS& all, NATURAL_LOOP* loop, LOOP_FACTS& facts);
+// Gives the test of a counter that nothing else needs to a pointer that steps beside it, and drops the counter's step
+// (pointer_tests.cpp); whether it did. `facts` is then stale.
+bool map_test_to_pointer(NATURAL_LOOPS& all, NATURAL_LOOP* loop, LOOP_FACTS& facts);
 // Whether only its NAME reads and writes a local scalar.
 bool is_private_scalar(const SYMTAB* sym);
 // The constant trip count that a test allows, or -1; `first` gets the counter's value at the first test that

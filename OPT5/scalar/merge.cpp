@@ -165,7 +165,7 @@ public:
     ~MERGE() {
         for (NODE* t : replaced) erase_tree(t);
     }
-    bool unite() { return unite_equal_inductions(loops, loop, facts); }
+    bool unite() { return unite_equal_inductions(loops, loop, facts) || map_test_to_pointer(loops, loop, facts); }
     void run();
 
 private:

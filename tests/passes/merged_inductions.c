@@ -251,6 +251,41 @@ int apart(const int *x, int n) {
     return s;
 }
 
+// A pointer that steps beside a counter takes its test: up, down and over a limit, with the pointer's step on either side of
+// the test and the loop perhaps not entered.
+// FUNCTION: beside
+// COUNT 0: n -=
+// COUNT 0: i +=
+// COUNT 0: m -=
+// COUNT 0: k -=
+long beside(const int *p, const long *q, int n, unsigned u) {
+    long s = u, i;
+    int m = n, k = 5, last = n;
+    while (n-- > 0) s = s * 3 + *p++;
+    while (m--) s = s * 3 + *q++;
+    while (u--) s ^= *--p;
+    for (i = 2; i <= last; i++) s += *++p;
+    do s = s * 5 + *q--;
+    while (--k);
+    return s;
+}
+
+// Not where the counter is needed, may wrap, or passes its limit by more than one; nor where a step is left out.
+// FUNCTION: not_beside
+// COUNT 1: /^n -= 1/
+// COUNT 2: /^u [-+]= [13]/
+// COUNT 1: /^k [+]= 1/
+long not_beside(const int *p, int n, unsigned u, int k) {
+    long s = 0;
+    while (n-- > 0) s = s * n + *p++;
+    do s = s * 3 + *p++;
+    while (--u > 60);
+    for (; u < 70; u += 3) s = s * 3 + *p--;
+    for (; k < 9; k++)
+        if (s & 1 << k) s ^= *p++;
+    return s;
+}
+
 int main(void) {
     for (int i = 0; i < 300; i++) a[i] = i ^ 5, b[i] = 300 - i;
     for (int i = 0; i < 64; i++) w[i] = i * 7L, next[i] = i % 3 + 1, m[i / 8][i % 8] = i;
@@ -273,6 +308,7 @@ int main(void) {
     put_i32(nests(8, 3));
     settled(2, 20, 5);
     put_i32(w[19] ^ m[2][3]);
+    for (int n = 0; n < 4; n++) put_i32(beside(a + 9, w + 9, n, n) ^ not_beside(a + 9, n, n + 60, n * 3));
     put_i16(together(a, 9) + together(a, 0) + apart(a, 5));
     return 0;
 }

@@ -5,7 +5,8 @@
 // number a variable has is replaced by that variable. Otherwise its occurrences are remembered, and once they would save
 // more than an assignment costs, the first of them is kept in a temporary ahead of its statement. A store gives the place
 // the number of what is stored, so that a load behind it finds that; so does a compound
-// assignment. What is assigned to a variable that has its number already is dropped.
+// assignment. What is assigned to a variable that has its number already is dropped. A remainder is computed from the
+// quotient of its operands where that is known.
 //
 // Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph; symbols are split anew.
 // Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
@@ -155,6 +156,12 @@ public:
     void begin_statement() { known.clear(); }
     // Of `a op b` in the type of a variable, or a place, that has the number `a` and is stepped by `b`.
     VALUE of_step(const NODE* asg, VALUE a, VALUE b);
+
+    // Of the quotient that belongs to a remainder.
+    VALUE of_quotient(const NODE* remainder) {
+        return computed_as({DIV, code_of(remainder->type), code_of(remainder->left->type), of(remainder->left),
+                            of(remainder->right)});
+    }
 
     void stored(const NODE* lvalue, VALUE v) {
         begin_statement(); // the place may hold temporaries now
@@ -347,6 +354,7 @@ private:
     void read_operands(NODE* t, bool is_certain);
     void read_place(NODE* t, bool is_certain);
     bool reuse(NODE*& slot, bool is_certain);
+    bool has_quotient(const NODE* remainder);
     SYMTAB* holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type);
     void keep(OCCURRENCES& known, VALUE v);
     NODE* take_first(OCCURRENCES& known, SYMTAB* variable);
@@ -540,8 +548,29 @@ SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, cons
     return nullptr;
 }
 
+bool COMMON_SUBEXPRESSIONS::has_quotient(const NODE* t) {
+    if (t->op != MOD || !code_of(t->type) || !code_of(t->left->type)) return false;
+    const VALUE v = numbers.of_quotient(t);
+    const OCCURRENCES& known = values[v];
+    return known.first || holder_of(known, v, t->type);
+}
+
+// x % y as x - x / y * y, which cannot overflow where the quotient does not.
+NODE* remainder_by_quotient(NODE* t) {
+    TYPE* type = t->type->stqs();
+    NODE* quotient = maketree(DIV, copy_tree(t->left), copy_tree(t->right), type, t->ls);
+    NODE* product = maketree(MULT, quotient, t->right, type, t->ls);
+    NODE* r = maketree(MINUS, t->left, product, type, t->ls);
+    erase_node(t);
+    return r;
+}
+
 // False where the operands are still to be looked at.
 bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
+    if (has_quotient(slot)) {
+        slot = remainder_by_quotient(slot);
+        numbers.begin_statement();
+    }
     NODE* t = slot;
     if (!good_CSE_tree(t, false) || !code_of(t->type)) return false;
     if (!is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF) return false;

@@ -39,6 +39,16 @@ int stepped(struct state *s, int d) {
     return s->index * s->step + a[s->index & 7] * s->step;
 }
 
+// A remainder comes of its quotient, where that was computed of the same values.
+// FUNCTION: remainders
+// COUNT 0: %
+// COUNT 2: x / y
+int remainders(int x, int y) {
+    int r = x / y * 10 + x % y;
+    x = ask(x);
+    return r ^ (x / y + x % y);
+}
+
 // Only the first of them is kept from the calls and stores in between, which may change it.
 // FUNCTION: changed
 // COUNT 5: _g * 3
@@ -106,6 +116,7 @@ int main(void) {
         put_i16(held(i, a + 3));
         exchanged(i + 4 & 7, i + 9);
         put_i16(stepped(&st, i));
+        put_i16(remainders(i * 77 - 9, i + 3));
         put_i16(changed(&g, i * 5) + changed(&h, i));
         put_i16(stepped_pointer(a + i + 3) + watched());
         put_i16(conditional(i, i + 3, i * i) + restricted(a, i + 3, i & 1));

@@ -46,6 +46,7 @@ public:
         for (const auto& [from, to] : scope_of) copy_scope_symbols(from, to);
         copy_blocks();
         for (const BBLK* bb = body.bb_list; bb; bb = bb->dflink) copy_contents(bb, block_of.at(bb));
+        copy_exception_table();
         return std::move(copy);
     }
 
@@ -133,6 +134,15 @@ private:
         for (const EDGE* e = from->successors; e; e = e->rest) connect(to, block_of.at(e->first), e->prob);
     }
 
+    void copy_exception_table() {
+        copy.eht = body.eht;
+        for (EHT_ITEM& item : copy.eht) {
+            if (!item.cleanup) continue;
+            item.cleanup = copy_tree(item.cleanup);
+            for_each_subtree(item.cleanup, [this](NODE* t) { remap(t); });
+        }
+    }
+
     void remap(NODE* t) {
         t->ls = scope(t->ls);
         if (t->op == NAME && t->u.sym) {
@@ -165,7 +175,8 @@ void save_cfg(FUNINFO* f) {
     f->saved_cfg = std::make_unique<FUNINFO>(f->name.c_str());
     FUNINFO* saved = f->saved_cfg.get();
     saved->symbol = f->symbol;
-    const CFG_COPY copy = copy_cfg(*f, saved);
+    CFG_COPY copy = copy_cfg(*f, saved);
+    saved->eht = std::move(copy.eht);
     saved->bb_list = copy.first;
     saved->ls_root = copy.ls_root;
     saved->has_bitfield_access = f->has_bitfield_access;

@@ -1,11 +1,11 @@
 // Copies of the bodies of functions, for call integration.
 #pragma once
 
+#include "OPT5/ir/funinfo.h"
+
 #include <unordered_map>
 #include <vector>
 
-class BBLK;
-class FUNINFO;
 class SYMTAB;
 struct LS;
 
@@ -14,6 +14,7 @@ struct CFG_COPY {
     BBLK* first = nullptr; // the entry; the others follow by `dflink`, `rdflink` and `uolink`
     BBLK* last = nullptr;
     std::vector<SYMTAB*> symbols; // all of the copied locals and parameters, on no list yet
+    std::vector<EHT_ITEM> eht;    // the labels of its clauses are stale: the dispatches tell
     LS* ls_root = nullptr;        // owned by whoever puts it in its place
     std::unordered_map<const SYMTAB*, SYMTAB*> symbol_of; // of the original; looked up
 };

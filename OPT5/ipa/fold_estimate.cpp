@@ -24,7 +24,7 @@ public:
         print_debug = write_opt_info = 0;
     }
     ~SCRATCH() {
-        for (BBLK* bb = f.bb_list; bb; bb = bb->dflink) erase_bblock(bb);
+        erase_all();
         currfuninfo = function;
         currfunc = symbol;
         print_debug = debug;
@@ -70,7 +70,8 @@ void bind(NODE* t, NODE* arguments) {
     *slot = coerce_to_type(parameter->type->stqs(), copy_tree(argument));
 }
 
-void give(FUNINFO* to, const CFG_COPY& copy) {
+void give(FUNINFO* to, CFG_COPY copy) {
+    to->eht = std::move(copy.eht);
     to->bb_list = copy.first;
     to->ls_root = copy.ls_root;
     for (auto s = copy.symbols.rbegin(); s != copy.symbols.rend(); ++s) {

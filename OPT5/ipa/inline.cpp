@@ -68,7 +68,7 @@ bool is_inline_candidate(const CALLSITE& site, const char** reason) {
 }
 
 bool has_body_to_copy(FUNINFO* f) {
-    return f->symbol && f->size && f->bb_list && !f->symbol->type->getr(TYPE::tpk_func)->vararg() && !f->has_eh();
+    return f->symbol && f->size && f->bb_list && !f->symbol->type->getr(TYPE::tpk_func)->vararg();
 }
 
 bool is_inlineable(const CALLSITE& site, const char** reason) {

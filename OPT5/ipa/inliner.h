@@ -183,7 +183,7 @@ void measure_density(bool known_only); // `known_only`: over the blocks that hav
 bool is_inline_candidate(const CALLSITE& site, const char** reason);
 bool is_inlineable(const CALLSITE& site, const char** reason);
 bool has_inline_qualifier(const FUNINFO* f);
-// Not so for one that finds its further arguments by the address of the last, nor for one with an exception table.
+// Not so for one that finds its further arguments by the address of the last.
 bool has_body_to_copy(FUNINFO* f);
 bool inline_commentary_is_on();
 // To the debug stream and, with an info file, to that.

@@ -9,11 +9,12 @@
 // Sound because what the call's statement evaluates beside the call has no order with it in the source: assignments
 // inside expressions are statements of their own by then. Arguments are evaluated once, ahead of the body, whether or not
 // the body reads them. The locals of the body are new in each expansion and no longer constant: in a loop they are set in
-// each iteration. A function with an exception table takes no part, on either side.
+// each iteration. Exceptions that leave the body find what they found when they left the call.
 #include "OPT5/ipa/inline.h"
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/ipa/copy_cfg.h"
+#include "OPT5/ipa/exceptions.h"
 #include "OPT5/ipa/inliner.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
@@ -31,6 +32,7 @@
 #include "UTIL/abort.h"
 
 #include <algorithm>
+#include <cstring>
 #include <unordered_map>
 #include <unordered_set>
 #include <vector>
@@ -69,6 +71,7 @@ public:
         walk(currfuninfo->bb_list, nullptr, false);
         if (!expansions) return;
         drop_markers();
+        renew_dispatches();
         refresh_marks();
         sym_split(currfuninfo);
         rebuildcfg();
@@ -104,7 +107,7 @@ bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
     FUNINFO* callee = find_FUNINFO_for_call(call);
     if (!callee || !callee->symbol || !callee->saved_cfg) return false;
     const bool is_wanted = is_chosen(call->call) || (deep && arguments_fit_parameters(call, callee->symbol));
-    if (!is_wanted || currfuninfo->has_eh() || find_pragma(currfunc, PRG_FUNC_SYNONYM)) {
+    if (!is_wanted || find_pragma(currfunc, PRG_FUNC_SYNONYM)) {
         unsuppress_inline_function(callee);
         left_alone.insert(call);
         return false;
@@ -252,12 +255,23 @@ void INTEGRATION::mark_calls(const CFG_COPY& copy, uint16_t depth) {
             });
 }
 
+// Whether the control statement stands behind a call that never returns.
+bool is_never_reached(const BBLK* bb) {
+    const LIST* before = bb->statements;
+    for (const LIST* s = before; s->rest; s = s->rest) before = s;
+    return before->rest && before->first->op == UMCALL && !std::strcmp(before->first->u.name, "_never_executed");
+}
+
 // Each end of the body leads on behind the call; `result` takes what is returned, if anything does.
 void INTEGRATION::end_returns(const CFG_COPY& copy, BBLK* following, SYMTAB* result) {
     for (BBLK* bb = copy.first;; bb = bb->dflink) {
         LIST* last = bb->last_statement();
         NODE* t = last->first;
-        if (t->op == RETURN || t->op == URETURN) {
+        if ((t->op == RETURN || t->op == URETURN) && is_never_reached(bb)) {
+            while (bb->successors) disconnect(bb, bb->successors->first);
+            erase_tree(t);
+            last->first = maketree(URETURN, mk_NAME(currfunc), nullptr, tp->void_t, LS::level_2_scope());
+        } else if (t->op == RETURN || t->op == URETURN) {
             NODE* value = t->op == RETURN ? t->right : nullptr;
             if (t->op == RETURN) t->right = nullptr;
             if (value && result)
@@ -349,6 +363,10 @@ void INTEGRATION::bind_arguments(NODE* call, const CFG_COPY& copy, const FUNINFO
             });
         if (bb == copy.last) break;
     }
+    for (const EHT_ITEM& item : currfuninfo->eht)
+        for_each_subtree(static_cast<const NODE*>(item.cleanup), [&reads](const NODE* t) {
+            if (t->op == NAME) reads[t->u.sym] += 2;
+        });
     std::unordered_map<const SYMTAB*, NODE**> place;
     for (NODE* asg : prolog)
         if (NODE** slot = parameter_in(asg)) {
@@ -429,6 +447,7 @@ BBLK* INTEGRATION::expand(BBLK* bb, LIST* cell, NODE** slot) {
     adopt(copy, call->ls);
     mark_calls(copy, call->call ? call->call->inline_depth : 0);
     merge_marks(body);
+    merge_exception_tables(copy, call->eh_entry());
 
     BBLK* following = split_ahead(bb, cell);
     drop_request(bb);

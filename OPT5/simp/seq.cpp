@@ -23,11 +23,18 @@ namespace {
 
 constexpr int ASM_COMMENT = 47;
 
+void dispatch_behind(NODE* t, LIST** out, PSN* psn) {
+    LBL* next = mklabel(0, nullptr, nullptr);
+    *out = mkelist(make_magic_EH_SWITCH(t, mk_LABELREF(next)), *out, psn);
+    *out = mkelist(mk_LABELDEF(next), *out, nullptr);
+}
+
 class SEQUENCER {
 public:
     // `simplified`: the tree that `statement` is first given has been through the simplifier as it stands.
-    SEQUENCER(LIST** statement_list, PSN* position, bool simplified)
-        : out(statement_list), psn(position), is_simplified(simplified) {}
+    // `dispatches`: what may lead to a handler is followed by its dispatch.
+    SEQUENCER(LIST** statement_list, PSN* position, bool simplified, bool dispatches = false)
+        : out(statement_list), psn(position), is_simplified(simplified), has_dispatches(dispatches) {}
 
     void statement(NODE* t) {
         const bool takes_apart = t->op == QUEST || t->op == ANDAND || t->op == OROR || t->op == COMMAOP ||
@@ -49,6 +56,9 @@ public:
         }
     }
 
+    // What was emitted last, but for dispatches; null for nothing.
+    const NODE* last_statement() const { return last; }
+
 private:
     // A branch right behind a conditional branch is what that one reaches when its condition is true.
     bool joined_to_if(NODE* t) {
@@ -68,7 +78,17 @@ private:
         return true;
     }
 
-    void emit(NODE* t) { *out = mkelist(t, *out, psn); }
+    void emit(NODE* t) {
+        const bool may_be_left = has_dispatches && statement_may_reach_catch(t);
+        if (NODE** value = may_be_left ? value_of_transfer(t) : nullptr; value && !tree_is_EH_SWITCH(t)) {
+            SYMTAB* held = sym_temp('R', -1, (*value)->type->stqs(), t->ls);
+            emit(mk_ASG(mk_NAME(held, t->ls), *value));
+            *value = mk_NAME(held, t->ls);
+        }
+        *out = mkelist(t, *out, psn);
+        last = t;
+        if (may_be_left && !op_transfers_control(t->op)) dispatch_behind(t, out, psn);
+    }
     void label(LBL* lbl) { emit(mk_LABELDEF(lbl)); }
     void branch(LBL* lbl) { emit(maketree(BRANCH, mk_LABELREF(lbl), nullptr, tp->int_t, scope)); }
     NODE* ref(LBL* lbl) { return mk_LABELREF(lbl); }
@@ -213,6 +233,8 @@ private:
     LIST** out;
     PSN* psn;
     bool is_simplified;
+    const bool has_dispatches;
+    const NODE* last = nullptr;
     LS* scope = nullptr;
 };
 
@@ -227,27 +249,6 @@ bool is_call_that_never_returns(const NODE* t) {
     if (!op_is_call(t->op)) return false;
     FUNINFO* callee = find_FUNINFO_for_call(t);
     return callee && TEST_FLAG(callee, FUN_never_returns);
-}
-
-bool entry_reaches_catch(uint32_t entry) {
-    const auto& eht = currfuninfo->eht;
-    for (size_t steps = 0; entry && entry < eht.size() && steps <= eht.size(); ++steps) {
-        if (eht[entry].kind == EHK_CATCH && !eht[entry].catches.empty()) return true;
-        entry = eht[entry].next_entry;
-    }
-    return false;
-}
-
-bool statement_may_reach_catch(NODE* t) {
-    bool found = false;
-    for_each_node(t, [&](NODE* n) { found = found || (op_is_call(n->op) && entry_reaches_catch(n->eh_entry())); });
-    return found;
-}
-
-void dispatch_behind(NODE* t, LIST** out, PSN* psn) {
-    LBL* next = mklabel(0, nullptr, nullptr);
-    *out = mkelist(make_magic_EH_SWITCH(t, mk_LABELREF(next)), *out, psn);
-    *out = mkelist(mk_LABELDEF(next), *out, nullptr);
 }
 
 } // namespace
@@ -277,23 +278,41 @@ void seq_trees(NODE* (*prepare)(NODE*)) {
         NODE* t = cell->first;
         PSN* psn = cell->psn;
         delete cell;
-        LIST* before = out;
         if (prepare) {
             t = prepare(t);
             replace_library_calls(&t);
         }
-        sequence_tree(t, &out, psn, !prepare);
-        if (out == before) continue;
-        if (is_call_that_never_returns(out->first))
-            end_flow_behind(&out, psn);
-        else if (catches && !op_transfers_control(out->first->op) && statement_may_reach_catch(out->first))
-            dispatch_behind(out->first, &out, psn);
+        SEQUENCER sequencer(&out, psn, !prepare, catches);
+        sequencer.statement(t);
+        if (const NODE* last = sequencer.last_statement(); last && is_call_that_never_returns(last)) end_flow_behind(&out, psn);
     }
     f->statements = out;
     f->has_vector_types = false;
 }
 
 // ---- Exception dispatch
+
+static bool entry_reaches_catch(uint32_t entry) {
+    const auto& eht = currfuninfo->eht;
+    for (size_t steps = 0; entry && entry < eht.size() && steps <= eht.size(); ++steps) {
+        if (eht[entry].kind == EHK_CATCH && !eht[entry].catches.empty()) return true;
+        entry = eht[entry].next_entry;
+    }
+    return false;
+}
+
+bool statement_may_reach_catch(const NODE* t) {
+    return any_subtree(t, [](const NODE* n) { return op_is_call(n->op) && entry_reaches_catch(n->eh_entry()); });
+}
+
+NODE** value_of_transfer(NODE* t) {
+    switch (t->op) {
+    case IF:
+    case SWITCH: return &t->left;
+    case RETURN: return &t->right;
+    default: return nullptr;
+    }
+}
 
 namespace {
 // A label of the input: the graph builder finds its block by the number.
@@ -304,17 +323,19 @@ NODE* ref_to_numbered(uint32_t label) {
 }
 } // namespace
 
-NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through) {
+NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through, const EH_HANDLERS* handlers) {
     LS* scope = call->ls;
     NODE* cases = nullptr;
     uint32_t count = 0;
     for (const EHT_ITEM& item : currfuninfo->eht)
         for (const EHT_CATCH& clause : item.catches) {
-            NODE* entry = maketree(CASE, mk_ICON(INT65(clause.id), tp->int_t),
-                                   ref_to_numbered(static_cast<uint32_t>(clause.label)), tp->int_t, scope);
+            if (handlers && !handlers->count(clause.id)) continue;
+            NODE* to = handlers ? mk_LABELREF(handlers->at(clause.id)) : ref_to_numbered(static_cast<uint32_t>(clause.label));
+            NODE* entry = maketree(CASE, mk_ICON(INT65(clause.id), tp->int_t), to, tp->int_t, scope);
             ++count;
             cases = cases ? maketree(COMMA, cases, entry, tp->int_t, scope) : entry;
         }
+    OPT_ASSERT(cases != nullptr);
     NODE* dflt = maketree(DEFAULT, fall_through, nullptr, tp->int_t, scope);
     NODE* sw = maketree(SWITCH, mk_MCALL(MAGIC_EH_NAME, nullptr, tp->int_t),
                         maketree(COMMA, cases, dflt, tp->int_t, scope), tp->int_t, scope);

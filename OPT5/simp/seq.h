@@ -1,6 +1,9 @@
 // Sequencing: from the raw statement trees of a function to statements without control flow at their root.
 #pragma once
 
+#include <cstdint>
+#include <unordered_map>
+
 class NODE;
 struct LIST;
 
@@ -29,6 +32,13 @@ NODE* convert_STASG_to_asgs(NODE* tree); // a chain of COMMAOPs
 // ---- Exceptions
 // The statement that stands for the dispatch of an exception behind a call: a SWITCH on a magic call whose cases lead
 // to the handlers. It keeps the handlers reachable while the function is optimized and is not written out.
-NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through);
+// `handlers`: where clauses lead, by their id; null while they are labels of the input. At least one is known.
+using EH_HANDLERS = std::unordered_map<int32_t, struct LBL*>;
+NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through, const EH_HANDLERS* handlers = nullptr);
+// Whether an exception that leaves a call of the statement may come to a handler of the current function.
+bool statement_may_reach_catch(const NODE* t);
+// What a statement tests or returns: calls in it that may lead to a handler are made ahead, with the dispatch between.
+// Null for other statements.
+NODE** value_of_transfer(NODE* t);
 // Records where the cases of a dispatch lead in the catch clauses of the current function.
 void update_eht_labels(NODE* tree, bool negated);

@@ -34,6 +34,7 @@ struct CALL_SITE {
     std::vector<TYPE*> types;
     SHAPE result;
     int64_t slot = 0; // in the frame, for a structure that comes back
+    uint32_t eh_entry = 0;
     std::string name;
 };
 
@@ -104,6 +105,7 @@ private:
     uint32_t cost = 0;
     size_t depth = 0, deepest = 0;
     std::vector<std::pair<uint32_t, const IC_NODE*>> jumps; // statement, label
+    const IC_ITEM* exception_table = nullptr;
     std::unordered_map<uint32_t, uint32_t> labels;          // number to statement
     std::vector<TRIP_PROMISE> promised;                     // of the loop whose head comes next
     std::string keyword;                                    // and its keyword in the source
@@ -163,5 +165,7 @@ private:
     void switch_table();
     void define(uint32_t label);
     void promise(const IC_ITEM& item);
+    void exceptions(const IC_ITEM& item);
+    uint32_t target(uint32_t label);
     void resolve();
 };

@@ -13,6 +13,7 @@ int64_t call_direct(const XNODE* x, MACHINE& m) {
     auto* values = static_cast<int64_t*>(alloca((site.args.size() + 1) * sizeof(int64_t)));
     evaluate(site, m, values);
     m.counts.calls++;
+    m.top->eh_entry = site.eh_entry;
     return m.invoke(*site.target, values, site.shapes.data(), site.shapes.size());
 }
 
@@ -21,6 +22,7 @@ int64_t call_library(const XNODE* x, MACHINE& m) {
     auto* values = static_cast<int64_t*>(alloca((site.args.size() + 1) * sizeof(int64_t)));
     evaluate(site, m, values);
     m.counts.calls++;
+    m.top->eh_entry = site.eh_entry;
     LIBRARY_ARGS args{m, values, site.shapes.data(), site.types.data(), site.args.size()};
     return run_library(*site.library, args, site.result);
 }
@@ -31,6 +33,7 @@ int64_t call_address(const XNODE* x, MACHINE& m) {
     const int64_t callee = run(site.callee, m);
     evaluate(site, m, values);
     m.counts.calls++;
+    m.top->eh_entry = site.eh_entry;
     return m.call(callee, values, site.shapes.data(), site.types.data(), site.args.size(), site.result);
 }
 
@@ -87,6 +90,7 @@ const XNODE* COMPILER::call(const IC_NODE* n) {
     if (!f) return unsupported(n); // no function runs before all are compiled
     CALL_SITE& site = *p.make<CALL_SITE>();
     site.result = shape_of(n->type);
+    site.eh_entry = n->number2;
     const IC_NODE* callee = strip_marks(n->left);
     const IC_NODE* named = callee->op == op::UAND ? strip_marks(callee->left) : callee;
     auto entry = named->op == op::NAME && named->sym ? p.entries.find(named->sym) : p.entries.end();

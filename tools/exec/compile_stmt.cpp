@@ -138,18 +138,31 @@ void COMPILER::statement(const IC_NODE* n, uint32_t line) {
     f->code[at].cost = cost;
 }
 
+// A branch to nowhere fails when it is executed.
+uint32_t COMPILER::target(uint32_t label) {
+    if (auto it = labels.find(label); it != labels.end()) return it->second;
+    STMT& s = add(S_FAIL, 0);
+    s.status = EXEC_BAD_FILE;
+    s.text = "branch to a label that is nowhere";
+    return static_cast<uint32_t>(f->code.size() - 1);
+}
+
+void COMPILER::exceptions(const IC_ITEM& item) {
+    f->handling.resize(size_t(item.number) + 1);
+    for (uint32_t i = 0; i < item.number; ++i) {
+        const EHT_ENTRY& entry = item.eht[i];
+        HANDLING& h = f->handling.at(entry.id);
+        h.kind = entry.kind;
+        h.next = entry.next;
+        if (entry.cleanup) h.cleanup = value(static_cast<const IC_NODE*>(entry.cleanup));
+        for (const I_CATCH_ENTRY& c : entry.catches) h.clauses.emplace_back(c.type_name, target(c.label));
+    }
+}
+
 // Labels are known now: branches and switches get their targets.
 void COMPILER::resolve() {
-    auto find = [&](const IC_NODE* label, uint32_t& target) {
-        auto it = label && label->op == op::LABEL ? labels.find(label->number) : labels.end();
-        if (it != labels.end()) {
-            target = it->second;
-            return;
-        }
-        target = static_cast<uint32_t>(f->code.size());
-        STMT& s = add(S_FAIL, 0);
-        s.status = EXEC_BAD_FILE;
-        s.text = "branch to a label that is nowhere";
+    auto find = [&](const IC_NODE* label, uint32_t& to) {
+        to = target(label && label->op == op::LABEL ? label->number : UINT32_MAX);
     };
     for (auto [at, n] : jumps) {
         uint32_t target = 0;
@@ -191,6 +204,7 @@ void COMPILER::function() {
             if (item.tree) statement(item.tree, line);
             break;
         case IFR_LABEL: define(item.number); break;
+        case IFR_EHT_HEADER: exception_table = &item; break;
         case IFR_PRAGMA:
         case IFR_LOOP:
             if (p.options.check) promise(item);
@@ -206,6 +220,7 @@ void COMPILER::function() {
         }
     }
     add(S_URETURN, line);
+    if (exception_table) exceptions(*exception_table);
     resolve();
     find_promised_loops(*f);
     f->frame = (f->frame + 3) & ~uint64_t{3};

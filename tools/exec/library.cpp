@@ -319,6 +319,8 @@ double single(double d) { return static_cast<float>(d); }
     }
 const LIBRARY_ENTRY entries[] = {
     NOTHING("put_i16", put(a, "%d\n", static_cast<int>(static_cast<int16_t>(a.i(0))))),
+    {"zthrow", 'v', [](LIBRARY_ARGS& a) -> int64_t { throw EXEC_THROW{a.i(0)}; }},
+    {"zcaught", 'i', [](LIBRARY_ARGS& a) -> int64_t { return a.m.caught; }},
     NOTHING("put_i32", put(a, "%d\n", static_cast<int>(a.i(0)))),
     NOTHING("put_u32", put(a, "%u\n", static_cast<unsigned>(a.i(0)))),
     NOTHING("put_i64", put(a, "%lld\n", static_cast<long long>(a.i(0)))),

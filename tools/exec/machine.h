@@ -83,6 +83,14 @@ struct STMT {
     int status = 0;
 };
 
+// What an exception that leaves a call finds, by exception entry.
+struct HANDLING {
+    uint32_t kind = 0; // EHT_ENTRY_KIND
+    uint32_t next = 0;
+    const XNODE* cleanup = nullptr;
+    std::vector<std::pair<std::string, uint32_t>> clauses; // what is caught, and the statement that it leads to
+};
+
 struct PARAMETER {
     SHAPE shape;
     int64_t offset;
@@ -108,6 +116,7 @@ struct FUNCTION {
     uint64_t calls = 0;
     bool variadic = false;
     std::vector<TRIP_PROMISE> promises; // of a checked run
+    std::vector<HANDLING> handling;     // the exception table, the root first; empty without one
 };
 
 struct LIBRARY_ENTRY;
@@ -124,6 +133,7 @@ struct ACTIVATION {
     FUNCTION* function;
     const STMT* at;
     ACTIVATION* up;
+    uint32_t eh_entry = 0; // of the call in work
 };
 
 struct EXEC_ERROR {
@@ -132,6 +142,10 @@ struct EXEC_ERROR {
 };
 struct EXEC_EXIT {
     int status;
+};
+// An exception of the program, thrown by `zthrow`: it is told by its number.
+struct EXEC_THROW {
+    int64_t value;
 };
 
 struct NODE_COUNTS {
@@ -154,6 +168,7 @@ struct MACHINE {
     int64_t old_value = 0, right_value = 0; // operands of a compound assignment in work
     uint64_t place = 0;                     // and its address
     int64_t returned = 0;
+    int64_t caught = 0; // the exception that came to a handler last
     ACTIVATION* top = nullptr;
     uintptr_t host_stack_end = 0; // no frame of the host below this
     std::vector<CALLEE> callees;  // by address - function_space

@@ -24,12 +24,28 @@ struct NO_WATCH {
     void step(uint32_t, uint32_t, MACHINE&) {}
 };
 
+// Cleans up along the chain of the call that an exception left. The statement of its handler, or false.
+bool find_handler(const FUNCTION& f, ACTIVATION& here, MACHINE& m, int64_t thrown, uint32_t* at) {
+    if (f.handling.empty()) return false;
+    for (uint32_t entry = here.eh_entry; entry; entry = f.handling.at(entry).next) {
+        const HANDLING& h = f.handling.at(entry);
+        if (h.kind == EHK_THROW_TERMINATE) m.fail(EXEC_ABORT, "an exception may not leave the call");
+        if (h.cleanup) run(h.cleanup, m);
+        for (const auto& [what, handler] : h.clauses)
+            if (what == "..." || what == std::to_string(thrown)) {
+                m.caught = thrown;
+                *at = handler;
+                return true;
+            }
+    }
+    return false;
+}
+
 template <class WATCH>
-void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
+void run_until_exception(FUNCTION& f, ACTIVATION& here, MACHINE& m, uint32_t at, WATCH& watch) {
     STMT* const code = f.code.data();
     const uint32_t returned = static_cast<uint32_t>(f.code.size());
-    WATCH watch(f);
-    for (uint32_t at = 0;;) {
+    for (;;) {
         const uint32_t from = at;
         STMT& s = code[at];
         here.at = &s;
@@ -59,6 +75,20 @@ void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
         }
         watch.step(from, at, m);
     }
+}
+
+template <class WATCH>
+void run_statements(FUNCTION& f, ACTIVATION& here, MACHINE& m) {
+    WATCH watch(f);
+    const uint64_t fp = m.fp, sp = m.sp;
+    for (uint32_t at = 0;;) try {
+            return run_until_exception(f, here, m, at, watch);
+        } catch (const EXEC_THROW& e) {
+            m.top = &here;
+            m.fp = fp;
+            m.sp = sp;
+            if (!find_handler(f, here, m, e.value, &at)) throw;
+        }
 }
 
 uint64_t aligned(uint64_t at, const SHAPE& shape) { return (at + shape.align_mask) & ~uint64_t{shape.align_mask}; }
@@ -143,6 +173,8 @@ int run_main(PROGRAM& p) {
         status = static_cast<int>(m.invoke(*main, none.data()) & 255);
     } catch (const EXEC_EXIT& e) {
         status = e.status;
+    } catch (const EXEC_THROW& e) {
+        m.fail(EXEC_ABORT, "nothing catches the exception " + std::to_string(e.value));
     }
     while (!m.at_exit.empty()) {
         const int64_t f = m.at_exit.back();

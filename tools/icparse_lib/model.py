@@ -31,10 +31,11 @@ class Op:
 
 class Node:
     """A tree. `value` is the payload: a number, text, `Symbol`, label number or member path element, by opcode."""
-    __slots__ = ("op", "type", "left", "right", "value")
+    __slots__ = ("op", "type", "left", "right", "value", "exception_entry")
 
     def __init__(self, op, type_, left=None, right=None, value=None):
         self.op, self.type, self.left, self.right, self.value = op, type_, left, right, value
+        self.exception_entry = 0  # of a call
 
 
 class Symbol:
@@ -93,10 +94,19 @@ class Pragma:
         self.kind, self.arguments = kind, arguments
 
 
+class ExceptionEntry:
+    """What an exception does that leaves a call: `what` is the tree of a clean-up, or text and label of a handler."""
+    PASS, CLEANUP, CATCH, TERMINATE = 0, 1, 2, 5
+
+    def __init__(self, kind, next_, what=None):
+        self.kind, self.next, self.what = kind, next_, what
+
+
 class FunctionBody:
     def __init__(self, symbol, position):
         self.symbol, self.position, self.end = symbol, position, position
         self.parameters = []
+        self.exceptions = []  # entries from 1; calls outside any region have entry 1 of a table
         self.block = Block(position)
 
 

@@ -4,7 +4,7 @@ from pycparser import c_ast as A
 from . import constants, literals, operators, pragmas, trees, types as T
 from .errors import CompileError, position_of
 from .initializers import ZeroRun
-from .model import Block, Label, Node, Op, Pragma, Statement, Text
+from .model import Block, ExceptionEntry, Label, Node, Op, Pragma, Statement, Text
 
 _VALUE_OPERATORS = {Op.PLUS, Op.MINUS, Op.MULT, Op.DIV, Op.MOD, Op.ANDB, Op.ORB, Op.XORB, Op.SLL, Op.SRL, Op.SCONV,
                     Op.PCONV, Op.PMCONV, Op.UMINUS, Op.NOTB, Op.EXCLAIM, Op.UAND} | trees.COMPARISONS
@@ -27,6 +27,7 @@ class Statements:
         self.labels = {}        # name: [number, defined, position of first use]
         self.break_labels, self.continue_labels, self.switches = [], [], []
         self.loop_pragmas = []  # for the next loop
+        self.regions = []  # exception entries that calls are in, the innermost last
         self.reachable = True
         self.builders = {
             A.Compound: self._compound, A.If: self._if, A.While: self._while, A.DoWhile: self._do, A.For: self._for,
@@ -38,6 +39,8 @@ class Statements:
 
     # ---- Emitting
     def emit(self, tree, where):
+        if self.regions:
+            self._enter_calls(tree)
         self.items.append(Statement(tree, where))
 
     def new_label(self):
@@ -123,11 +126,48 @@ class Statements:
         if isinstance(node, A.FuncCall) and isinstance(node.name, A.ID) and node.name.name == "asm":
             self.items.append(Text(assembly_text(node, where), where))
             return
+        if isinstance(node, A.FuncCall) and isinstance(node.name, A.ID) and node.name.name.startswith("__eh_"):
+            self._exception_region(node.name.name, node.args.exprs if node.args else [], where)
+            return
         self.effects(self.expressions.value(node), where)
+
+    # ---- Exceptions: what zrun.h says of them
+    def _enter_calls(self, tree):
+        pending = [tree]
+        while pending:
+            node = pending.pop()
+            if node.op in (Op.CALL, Op.UCALL):
+                node.exception_entry = self.regions[-1]
+            pending += [n for n in (node.left, node.right) if n is not None]
+
+    def _exception_region(self, name, arguments, where):
+        entries = self.body.exceptions
+        if not entries:
+            entries.append(ExceptionEntry(ExceptionEntry.PASS, 0))
+        outer = self.regions[-1] if self.regions else 1
+        if name == "__eh_end" and self.regions:
+            self.regions.pop()
+            return
+        if name == "__eh_catch" and len(arguments) == 2 and isinstance(arguments[0], A.Constant):
+            number = self._named_label(arguments[1].name, where)[0]
+            self.referenced.add(number)
+            entry = ExceptionEntry(ExceptionEntry.CATCH, outer, (arguments[0].value.strip('"'), number))
+        elif name == "__eh_cleanup" and len(arguments) == 1:
+            tree = self.expressions.value(arguments[0])
+            self._enter_calls(tree) if self.regions else None
+            entry = ExceptionEntry(ExceptionEntry.CLEANUP, outer, tree)
+        elif name == "__eh_terminate" and not arguments:
+            entry = ExceptionEntry(ExceptionEntry.TERMINATE, outer)
+        else:
+            raise CompileError(where, f"{name} is wrong here")
+        entries.append(entry)
+        self.regions.append(len(entries))
 
     def function_body(self, compound):
         for item in compound.block_items or []:
             self.statement(item)
+        if self.regions:
+            raise CompileError(self.body.position, "a region of exceptions has no end")
         for name, (_, defined, where) in self.labels.items():
             if not defined:
                 raise CompileError(where, f"label '{name}' is not defined")

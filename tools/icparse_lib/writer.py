@@ -4,13 +4,14 @@ A file is a stream of records (kind, size, payload): header, functions, initiali
 global symbols. The header holds the sections' offsets and is put in place last.
 """
 from . import types as T
-from .model import Block, FunctionBody, Label, Op, Pragma, Statement, Text
+from .model import Block, ExceptionEntry, FunctionBody, Label, Op, Pragma, Statement, Text
 
 VERSION, TARGET = -71, 600
 MAGIC = b"!<icode>\n\0"
 
 BEGIN_FUNCTION, END_FUNCTION, BEGIN_BLOCK, END_BLOCK, END_ARGUMENTS, END_LOCALS = 1, 2, 3, 4, 5, 6
 HEADER, SYMBOL, ASSEMBLY, LABEL, EXPRESSION, PRAGMA, NODE = 8, 35, 36, 42, 46, 94, 101
+CATCHES, EXCEPTION, EXCEPTIONS = 63, 91, 93
 INITIALIZER, OPTION_SET, TYPE, FILE_NAME = 105, 111, 116, 126
 END = b"\xff"
 
@@ -274,8 +275,22 @@ class Writer:
         for symbol in body.block.symbols:
             self._local(symbol, 2)
         self.out += record(END_LOCALS, where)
+        self.has_exceptions = bool(body.exceptions)
         self._items(body.block.items, 2)
+        self._exceptions(body.exceptions)
         self.out += record(END_FUNCTION, self.files.position(body.end))
+
+    def _exceptions(self, entries):
+        if entries:
+            self.out += record(EXCEPTIONS, uint(len(entries)))
+        for number, entry in enumerate(entries, 1):
+            catches = entry.kind == ExceptionEntry.CATCH
+            self.out += record(EXCEPTION, uint(number) + uint(entry.kind) + uint(entry.next) + uint(catches))
+            if catches:
+                self.out += record(CATCHES, text(entry.what[0]) + uint(entry.what[1]) + flag(False))
+            elif entry.kind == ExceptionEntry.CLEANUP:
+                self.out += record(EXPRESSION, self.files.position(None))
+                self._tree(entry.what)
 
     def _local(self, symbol, level):
         symbol.index, symbol.level = self.locals, level
@@ -332,9 +347,9 @@ class Writer:
             csu, member = value
             return b"\1" + uint(member.number) + self.types.number(csu)
         if op == Op.CALL:
-            return uint(value or 0) + uint(0)
+            return uint(value or 0) + uint(node.exception_entry or self.has_exceptions)
         if op == Op.UCALL:
-            return uint(0)
+            return uint(node.exception_entry or self.has_exceptions)
         if op in (Op.LABELREF, Op.SWITCH, Op.SKIP):
             return uint(value)
         if op in (Op.ICALL, Op.UICALL, Op.MCALL, Op.UMCALL):

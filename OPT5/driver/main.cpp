@@ -6,6 +6,7 @@
 #include "OPT5/driver/passes.h"
 #include "OPT5/io/write.h"
 #include "OPT5/ipa/inline.h"
+#include "OPT5/ipa/positions.h"
 #include "OPT5/ipa/progana.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -62,6 +63,7 @@ bool optimize_unit(int argc, char** argv) {
     } else {
         run_functions(output_function);
         dump_psnrefs();
+        dump_psnmap();
     }
     return true;
 }

@@ -17,7 +17,6 @@ register_option pass_debug_dump_infix_regs("debug:dump_infix_regs");
 register_option pass_debug_dump_infix_types("debug:dump_infix_types");
 register_option pass_debug_dump_minimal("debug:dump_minimal");
 register_option pass_debug_dump_otypes("debug:dump_otypes");
-register_option pass_debug_dump_psn("debug:dump_psn");
 register_option pass_debug_dump_scope("debug:dump_scope");
 register_option pass_debug_dump_sym_addr("debug:dump_sym_addr");
 register_option pass_debug_dump_tree_hint("debug:dump_tree_hint");

@@ -61,6 +61,7 @@ private:
         to->depth = from->depth;
         to->kind = from->kind;
         to->flags = from->flags;
+        to->line_offset = from->line_offset;
         scope_of[from] = to;
         for (const LS* child = from->first_child; child; child = child->next_sibling) {
             LS* c = copy_scope_tree(child, to);

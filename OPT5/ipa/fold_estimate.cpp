@@ -87,7 +87,7 @@ void estimate_folding(CALLSITE& site) {
     if (!callee->symbol || !site.args || !type_of_nth_parameter(0, callee->symbol) || !callee->bb_list ||
         !tree_is_arg_prolog(callee->bb_list->statements->first))
         return;
-    int before, after;
+    long before, after;
     {
         sym_split(callee);
         SCRATCH scratch(callee);
@@ -101,6 +101,6 @@ void estimate_folding(CALLSITE& site) {
         after = count_nodes();
     }
     if (after > 0) site.fold_ratio = static_cast<float>(before) / static_cast<float>(after);
-    inline_commentary("[constant folding in %s:  before %d, after %d, ratio %.2f]\n", callee->name.c_str(), before, after,
+    inline_commentary("[constant folding in %s:  before %ld, after %ld, ratio %.2f]\n", callee->name.c_str(), before, after,
                       static_cast<double>(site.fold_ratio));
 }

@@ -30,7 +30,6 @@ void create_inliner() {
 }
 bool inline_recursion_is_limited() { return !inliner || inliner->warn_inline_recursion_limit(); }
 void init_proc_integration() { unsuppressed_funinfos.clear(); }
-void dump_psnrefs() {}
 
 bool inline_commentary_is_on() { return pass_debug_inline_commentary; }
 

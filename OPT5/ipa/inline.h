@@ -13,6 +13,3 @@ void auto_inline_call_sites();
 void integrate_calls_in_function();
 // Whether expansion through expansion stops at a depth.
 bool inline_recursion_is_limited();
-
-// The list of positions whose function was integrated elsewhere, to the debug stream.
-void dump_psnrefs();

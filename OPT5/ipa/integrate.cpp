@@ -16,6 +16,7 @@
 #include "OPT5/ipa/copy_cfg.h"
 #include "OPT5/ipa/exceptions.h"
 #include "OPT5/ipa/inliner.h"
+#include "OPT5/ipa/positions.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
@@ -78,6 +79,7 @@ public:
         changed(fact::none);
         simpcfg(0, 0);
         fast_CP(4, 1);
+        if (print_debug) print_what_was_inlined();
     }
 
 private:
@@ -89,13 +91,16 @@ private:
     BBLK* separate(BBLK* bb, LIST* cell, NODE** condition);
     BBLK* split_ahead(BBLK* bb, LIST* cell);
     void bind_arguments(NODE* call, const CFG_COPY& copy, const FUNINFO* body, PSN* psn);
-    void adopt(CFG_COPY& copy, LS* scope);
+    void adopt(CFG_COPY& copy, LS* scope, const PSN* psn);
     void end_returns(const CFG_COPY& copy, BBLK* following, SYMTAB* result);
     void mark_calls(const CFG_COPY& copy, uint16_t depth);
     void drop_markers();
     void refresh_marks();
+    void print_what_was_inlined() const;
 
     std::unordered_set<const NODE*> left_alone; // calls; membership only
+    std::vector<FUNINFO*> inlined_funinfo;      // what has been expanded in the current function, in order
+    std::vector<LS*> inlined_scopes;            // and the scopes of the copies
     const PSN* current_psn = nullptr;
     long expansions = 0, nested = 0;
 };
@@ -103,7 +108,7 @@ private:
 // ---- Which calls
 
 bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
-    if (left_alone.count(call)) return false;
+    if (!call->call || left_alone.count(call)) return false;
     FUNINFO* callee = find_FUNINFO_for_call(call);
     if (!callee || !callee->symbol || !callee->saved_cfg) return false;
     const bool is_wanted = is_chosen(call->call) || (deep && arguments_fit_parameters(call, callee->symbol));
@@ -112,12 +117,12 @@ bool INTEGRATION::is_to_expand(NODE* call, bool deep) {
         left_alone.insert(call);
         return false;
     }
-    if (call->call && call->call->inline_depth > 0 && nested >= (deep ? MOST_FORCED_DEEP : MOST_NESTED)) {
+    if (call->call->inline_depth > 0 && nested >= (deep ? MOST_FORCED_DEEP : MOST_NESTED)) {
         unsuppress_inline_function(callee);
         left_alone.insert(call);
         return false;
     }
-    if (inline_recursion_is_limited() && call->call && call->call->inline_depth >= depth_limit()) {
+    if (inline_recursion_is_limited() && call->call->inline_depth >= depth_limit()) {
         if (print_debug) debug_printf("\n\t>>>>> WARNING: INLINE recursion limit exceeded.\n");
         if (write_opt_info)
             info_printf("\n>>>> WARNING: INLINE recursion limit exceeded on line %ld.\n", current_psn ? current_psn->line : 0L);
@@ -179,7 +184,8 @@ BBLK* INTEGRATION::split_ahead(BBLK* bb, LIST* cell) {
         drop_statement(&bb->statements);
         return next;
     }
-    while (before->rest != cell) before = before->rest;
+    while (before && before->rest != cell) before = before->rest;
+    if (!before) optassert("find(sl->first, bb->statements) != NULL", __FILE__, __LINE__);
     return split_block(bb, before, false);
 }
 
@@ -231,10 +237,14 @@ BBLK* INTEGRATION::separate(BBLK* bb, LIST* cell, NODE** condition) {
 }
 
 // The copy's locals and scopes become the function's.
-void INTEGRATION::adopt(CFG_COPY& copy, LS* scope) {
+void INTEGRATION::adopt(CFG_COPY& copy, LS* scope, const PSN* psn) {
     FUNINFO* f = currfuninfo;
     if (!scope) scope = LS::level_2_scope();
-    if (copy.ls_root && scope) scope->splice_scope(copy.ls_root);
+    if (copy.ls_root && scope) {
+        scope->splice_scope(copy.ls_root);
+        copy.ls_root->offset_scope(psn ? psn->line : 0);
+        inlined_scopes.push_back(copy.ls_root);
+    }
     for (auto s = copy.symbols.rbegin(); s != copy.symbols.rend(); ++s) {
         SYMTAB* sym = *s;
         if (sym->level == 1) { // what the body names of a parameter is a variable now
@@ -296,6 +306,7 @@ void INTEGRATION::end_returns(const CFG_COPY& copy, BBLK* following, SYMTAB* res
 
 // The NAME of a parameter that an assignment of the prolog copies, through its casts.
 NODE** parameter_in(NODE* asg) {
+    OPT_ASSERT(asg->op == ASG || asg->op == STASG);
     NODE** slot = &asg->right;
     while ((*slot)->op == SCONV || (*slot)->op == PCONV || (*slot)->op == ISP2CHAR) slot = &(*slot)->left;
     return (*slot)->op == NAME ? slot : nullptr;
@@ -402,8 +413,6 @@ void merge_marks(const FUNINFO* body) {
     f->has_cqual10_name |= body->has_cqual10_name;
     f->has_nasserts |= body->has_nasserts;
     f->has_intrinsics |= body->has_intrinsics;
-    f->has_vector_types |= body->has_vector_types;
-    f->has_complex_types |= body->has_complex_types;
 }
 
 // A pragma that asked for the expansion is done with: it would be taken for a wish about the next statement.
@@ -420,15 +429,21 @@ void drop_request(BBLK* bb) {
     }
 }
 
-BBLK* INTEGRATION::expand(BBLK* bb, LIST* cell, NODE** slot) {
-    NODE *call = *slot, *statement = cell->first;
+void check_branch_of_split(const NODE* branch) {
+    if (branch->op != BRANCH) optassert("bb->statements->first->op == BRANCH", __FILE__, __LINE__);
+    if (branch->left->op != LABELREF) optassert("bb->statements->first->left->op == LABELREF", __FILE__, __LINE__);
+}
+
+BBLK* INTEGRATION::expand(BBLK* bb, LIST* sl, NODE** slot) {
+    NODE *call = *slot, *statement = sl->first;
     FUNINFO* callee = find_FUNINFO_for_call(call);
-    OPT_ASSERT(tree_is_subtree_of_tree(call, statement));
+    if (!call->call) optassert("call->u2.ocall != NULL", __FILE__, __LINE__);
+    OPT_ASSERT(tree_is_subtree_of_tree(call, sl->first));
     if (print_debug)
-        debug_printf("\n\t>>>>> (%ld) Integrating procedure %s() <<<<<\n", cell->psn ? cell->psn->line : 0L,
+        debug_printf("\n\t>>>>> (%ld) Integrating procedure %s() <<<<<\n", sl->psn ? sl->psn->line : 0L,
                      callee->name.c_str());
     ++expansions;
-    if (call->call && call->call->inline_depth > 0) nested += callee->size;
+    if (call->call->inline_depth > 0) nested += callee->size;
 
     // What takes the result.
     const bool is_statement = statement == call;
@@ -444,34 +459,39 @@ BBLK* INTEGRATION::expand(BBLK* bb, LIST* cell, NODE** slot) {
 
     const FUNINFO* body = callee->saved_cfg.get();
     CFG_COPY copy = copy_cfg(*body, currfuninfo);
-    adopt(copy, call->ls);
-    mark_calls(copy, call->call ? call->call->inline_depth : 0);
+    adopt(copy, call->ls, sl->psn);
+    inlined_funinfo.push_back(callee);
+    enter_positions(copy, callee->symbol);
+    psnref_add(callee->symbol);
+    mark_calls(copy, call->call->inline_depth);
     merge_marks(body);
     merge_exception_tables(copy, call->eh_entry());
 
-    BBLK* following = split_ahead(bb, cell);
+    BBLK* following_bb = split_ahead(bb, sl);
     drop_request(bb);
-    OPT_ASSERT(following && following != bb);
+    OPT_ASSERT(following_bb != NULL);
+    OPT_ASSERT(bb != following_bb);
+    check_branch_of_split(bb->branch());
     bb->dflink = bb->uolink = copy.first;
     copy.first->rdflink = bb;
-    copy.last->dflink = copy.last->uolink = following;
-    following->rdflink = copy.last;
-    subst_bb_for_bb_in_bb(copy.first, following, bb);
-    disconnect(bb, following);
+    copy.last->dflink = copy.last->uolink = following_bb;
+    following_bb->rdflink = copy.last;
+    subst_bb_for_bb_in_bb(copy.first, following_bb, bb);
+    disconnect(bb, following_bb);
     connect(bb, copy.first);
-    end_returns(copy, following, result);
-    bind_arguments(call, copy, body, cell->psn);
+    end_returns(copy, following_bb, result);
+    bind_arguments(call, copy, body, sl->psn);
 
     // What is left of the call.
     NODE* left = is_plain || is_statement || call->type->is_void() ? mk_ICON(INT65(0), tp->int_t) : mk_NAME(result, call->ls);
     if (is_plain || is_statement) {
         erase_tree(statement);
-        cell->first = left;
+        sl->first = left;
     } else {
         *slot = left->type->is_scalar() ? coerce_to_type(call->type->stqs(), left) : left;
         erase_tree(call);
     }
-    return following;
+    return following_bb;
 }
 
 // ---- The end
@@ -487,11 +507,20 @@ void INTEGRATION::drop_markers() {
 }
 
 void INTEGRATION::refresh_marks() {
-    bool calls = false;
-    for_each_tree(currfuninfo, [&calls](const NODE* tree) {
-        calls = calls || any_subtree(tree, [](const NODE* t) { return op_is_call(t->op); });
+    FUNINFO* f = currfuninfo;
+    f->no_calls = true;
+    f->has_vector_types = f->has_complex_types = false;
+    for_each_tree(f, [f](const NODE* tree) {
+        f->no_calls = f->no_calls && !any_subtree(tree, [](const NODE* t) { return op_is_call(t->op); });
+        f->has_vector_types = f->has_vector_types || vector_types_exist_in_tree(tree);
+        f->has_complex_types = f->has_complex_types || complex_types_exist_in_tree(tree);
     });
-    currfuninfo->no_calls = !calls;
+}
+
+void INTEGRATION::print_what_was_inlined() const {
+    for (const FUNINFO* f : inlined_funinfo) debug_printf("\tinlined: %s()\n", f->name.c_str());
+    for (const LS* scope : inlined_scopes)
+        debug_printf("\tscope of a copy: #%u, depth %u, lines from %ld\n", scope->id, scope->depth, scope->line_offset);
 }
 
 } // namespace

@@ -47,7 +47,7 @@ public:
                 inline_commentary("[count for %s now set to 1]\n", f->name.c_str());
             }
             for (const CALLSITE* site : file.sites_of(f)) pass_on(*site);
-            inline_commentary("[count for %s (%p):  %u]\n", f->name.c_str(), static_cast<void*>(nullptr), f->entry_count);
+            inline_commentary("[count for %s (%p):  %d]\n", f->name.c_str(), static_cast<void*>(nullptr), static_cast<int>(f->entry_count));
         }
     }
 

@@ -42,4 +42,5 @@ void check_integrable_definition() {
     if (!may || (!asked_for && wide > WIDE_LOCALS_LIMIT)) set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
 }
 
+// Symbols are laid out in groups on targets that address them from one base; this one has no groups.
 void make_symbol_groupable(SYMTAB*) {}

@@ -140,6 +140,11 @@ void LS::splice_scope(LS* tree) {
     set_depth(tree, depth + 1);
 }
 
+void LS::offset_scope(long lines) {
+    line_offset += lines;
+    for (LS* child = first_child; child; child = child->next_sibling) child->offset_scope(lines);
+}
+
 void LS::validate() const {
     for (const LS* child = first_child; child; child = child->next_sibling) {
         OPT_ASSERT(child->parent == this && child->depth == depth + 1);
@@ -149,8 +154,8 @@ void LS::validate() const {
 
 void LS::print(FILE* out, int indent) const {
     std::fprintf(out, "%*sSCOPE #%u depth %u", indent, "", id, depth);
-    if (open_psn) std::fprintf(out, " [%s:%ld", open_psn->file ? open_psn->file : "NO_FILE", open_psn->line);
-    if (open_psn) std::fprintf(out, "-%ld]", close_psn ? close_psn->line : 0L);
+    if (open_psn) std::fprintf(out, " [%s:%ld", open_psn->file ? open_psn->file : "NO_FILE", open_psn->line + line_offset);
+    if (open_psn) std::fprintf(out, "-%ld]", close_psn ? close_psn->line + line_offset : 0L);
     struct {
         const char* title;
         const SYMLIST* list;

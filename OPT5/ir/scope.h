@@ -53,6 +53,7 @@ struct LS {
     uint32_t depth = 0;
     uint32_t kind = 0;
     uint8_t flags = 0;
+    long line_offset = 0; // of a body that was integrated: its lines count from the call's
 
     ~LS(); // the children too
 
@@ -79,6 +80,7 @@ struct LS {
     static void build_PTR_equivalence_groups();
     // Hooks a scope tree that has no parent behind the last child of this one, which owns it then.
     void splice_scope(LS* tree);
+    void offset_scope(long lines); // with the scopes in it
     void validate() const;
     void print(FILE* out, int indent = 0) const;
 };

@@ -120,6 +120,14 @@ bool is_magic_EH_MCALL(const NODE* t) {
     return (t->op == MCALL || t->op == UMCALL) && !std::strcmp(t->u.name, MAGIC_EH_NAME);
 }
 
+bool vector_types_exist_in_tree(const NODE* t) {
+    return any_subtree(t, [](const NODE* n) { return n->type->is_vector(); });
+}
+
+bool complex_types_exist_in_tree(const NODE* t) {
+    return any_subtree(t, [](const NODE* n) { return n->type->is_complex(); });
+}
+
 bool tree_is_EH_SWITCH(const NODE* t) {
     return t && t->op == SWITCH && t->left && t->left->op == UMCALL && is_magic_EH_MCALL(t->left);
 }

@@ -67,6 +67,8 @@ bool tree_is_ASM_comment(const NODE* t);
 constexpr char MAGIC_EH_NAME[] = "eh$dispatch";
 bool is_magic_EH_MCALL(const NODE* t);
 bool tree_is_EH_SWITCH(const NODE* t); // `t` may be null
+bool vector_types_exist_in_tree(const NODE* t);
+bool complex_types_exist_in_tree(const NODE* t);
 bool tree_is_arg_prolog(const NODE* t);
 bool stmt_is_arg_prolog(const LIST* stmt);
 bool tree_is_extended_arg_prolog(const NODE* t, const NODE* first);

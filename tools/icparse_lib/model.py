@@ -106,7 +106,7 @@ class FunctionBody:
     def __init__(self, symbol, position):
         self.symbol, self.position, self.end = symbol, position, position
         self.parameters = []
-        self.exceptions = []  # entries from 1; calls outside any region have entry 1 of a table
+        self.exceptions = []  # from entry 1, which passes on
         self.block = Block(position)
 
 

@@ -156,6 +156,9 @@ class Statements:
             tree = self.expressions.value(arguments[0])
             self._enter_calls(tree) if self.regions else None
             entry = ExceptionEntry(ExceptionEntry.CLEANUP, outer, tree)
+        elif name == "__eh_pass" and not arguments:
+            self.regions.append(outer)
+            return
         elif name == "__eh_terminate" and not arguments:
             entry = ExceptionEntry(ExceptionEntry.TERMINATE, outer)
         else:

@@ -275,7 +275,6 @@ class Writer:
         for symbol in body.block.symbols:
             self._local(symbol, 2)
         self.out += record(END_LOCALS, where)
-        self.has_exceptions = bool(body.exceptions)
         self._items(body.block.items, 2)
         self._exceptions(body.exceptions)
         self.out += record(END_FUNCTION, self.files.position(body.end))
@@ -347,9 +346,9 @@ class Writer:
             csu, member = value
             return b"\1" + uint(member.number) + self.types.number(csu)
         if op == Op.CALL:
-            return uint(value or 0) + uint(node.exception_entry or self.has_exceptions)
+            return uint(value or 0) + uint(node.exception_entry)
         if op == Op.UCALL:
-            return uint(node.exception_entry or self.has_exceptions)
+            return uint(node.exception_entry)
         if op in (Op.LABELREF, Op.SWITCH, Op.SKIP):
             return uint(value)
         if op in (Op.ICALL, Op.UICALL, Op.MCALL, Op.UMCALL):

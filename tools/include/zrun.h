@@ -12,7 +12,7 @@ void put_str(const char *text);
 
 /* Exceptions. Between __eh_catch(K, handler) or __eh_cleanup(f(x)) or __eh_terminate() and __eh_end(), what zthrow(K)
    throws out of a call goes to the label, calls f(x) and goes on, or ends the program. K may be "...", for any. In
-   the handler zcaught() tells what came. */
+   the handler zcaught() tells what came. __eh_pass() begins a region in which exceptions are known to leave calls. */
 void zthrow(int what);
 int zcaught(void);
 

@@ -176,7 +176,7 @@ void number_functions(const std::vector<FUNINFO*>& list) {
     for (FUNINFO* f : list) f->cg_order = -1;
     FUNINFO* file = program.file_fun;
     if (!file->callees) return;
-    constexpr int16_t ENTERED = -2;
+    constexpr int32_t ENTERED = -2;
     std::vector<FUNINFO*> stack{file};
     file->cg_order = ENTERED;
     file->cg_cursor = file->callees;
@@ -195,7 +195,7 @@ void number_functions(const std::vector<FUNINFO*>& list) {
         stack.pop_back();
         finished = mkFUNLIST(f, finished);
     }
-    int16_t n = 0;
+    int32_t n = 0;
     for (FUNLIST* p = finished; p; p = p->next) p->fun->cg_order = n++;
     program.cg_count = n;
     cg_list = finished;
@@ -251,6 +251,8 @@ void add_edges(FUNINFO* f, GRAPH& graph) {
             if (function_is_defined(c->callee)) edge_to(c->callee);
 }
 
+std::vector<std::unique_ptr<BITVEC>> reach_sets; // by strong component; its functions share the set
+
 // The transitive closure, by strong components: their numbers come in the order of a walk that finishes what a
 // component reaches before the component itself, so that one pass in that order sees every successor's set complete.
 void compute_reach(const std::vector<FUNINFO*>& order) {
@@ -261,20 +263,25 @@ void compute_reach(const std::vector<FUNINFO*>& order) {
     const size_t components = boost::strong_components(graph, component.data());
     std::vector<std::vector<size_t>> members(components);
     for (size_t v = 0; v < n; ++v) members[component[v]].push_back(v);
-    std::vector<BITVEC> reach(components, BITVEC(static_cast<uint32_t>(n)));
-    for (size_t c = 0; c < components; ++c)
+    reach_sets.clear();
+    for (size_t c = 0; c < components; ++c) {
+        auto set = std::make_unique<BITVEC>(static_cast<uint32_t>(n));
+        bool has_cycle = false;
         for (size_t v : members[c])
             for (auto [e, end] = boost::out_edges(v, graph); e != end; ++e) {
                 const size_t to = boost::target(*e, graph);
-                reach[c].set(static_cast<uint32_t>(to));
-                if (component[to] != c)
-                    reach[c] |= reach[component[to]];
-                else
-                    for (size_t member : members[c]) reach[c].set(static_cast<uint32_t>(member));
+                if (component[to] == c) {
+                    has_cycle = true;
+                } else if (!set->test(static_cast<uint32_t>(to))) {
+                    set->set(static_cast<uint32_t>(to));
+                    *set |= *reach_sets[component[to]];
+                }
             }
-    for (size_t v = 0; v < n; ++v) {
-        delete order[v]->reach;
-        order[v]->reach = new BITVEC(reach[component[v]]);
+        for (size_t v : members[c]) {
+            if (has_cycle) set->set(static_cast<uint32_t>(v));
+            order[v]->reach = set.get();
+        }
+        reach_sets.push_back(std::move(set));
     }
 }
 

@@ -40,7 +40,7 @@ struct PROGRAM {
     CALLEE* outside_callees = nullptr;
     FUNINFO* file_fun = nullptr; // stands for the outside world; its callees are the roots
     uint8_t file_flags = 0;
-    int16_t cg_count = 0; // numbered functions plus one: the width of `FUNINFO::reach`
+    int32_t cg_count = 0; // numbered functions plus one: the width of `FUNINFO::reach`
     bool main_runs_once = true;
     std::vector<std::string> assembly; // texts, which may name any symbol
 };

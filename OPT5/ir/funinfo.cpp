@@ -219,7 +219,7 @@ constexpr FLAG_NAME flag_names[] = {
 void dump_funinfo_to(FILE* out, FUNINFO* f) {
     std::fprintf(out, "\nFunction %s()\n", f->name.c_str());
     if (f->size) std::fprintf(out, "Its integrable body size is %u units\n", f->size);
-    std::fprintf(out, "called from %d sites\n", f->ncallers);
+    std::fprintf(out, "called from %u sites\n", f->ncallers);
     const uint64_t flags = get_flags(f);
     std::fprintf(out, "It has these properties: 0x%08lx\n", static_cast<unsigned long>(flags));
     for (const FLAG_NAME& row : flag_names)

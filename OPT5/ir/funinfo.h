@@ -100,15 +100,15 @@ public:
     std::mutex flags_lock; // guards every access to the flags; use the functions below
     uint32_t size = 0;     // integrable body size, 0: cannot be integrated
     CALLEE* cg_cursor = nullptr;
-    BITVEC* reach = nullptr;
-    int16_t cg_order = -1;
-    uint16_t ncallers = 0;
+    const BITVEC* reach = nullptr; // borrowed
+    int32_t cg_order = -1;
+    uint32_t ncallers = 0;
     int8_t nargs_called = -1;
     uint32_t profile_status = 0; // 0 no profile, 1 forced during inlining, 2 profiled
     uint32_t entry_count = 0xFFFFFFFF;
     uint32_t unique_call_index = 0; // ids given to the call sites of this function so far
     BITVEC *inline_sites = nullptr, *forced_sites = nullptr, *deep_sites = nullptr;
-    uint16_t sites_left = 0;
+    uint32_t sites_left = 0;
     uint32_t est_time = 0, est_bbs = 0, est_syms = 0, est_loops = 0, est_ncalls = 0, est_pressure = 0, density = 0;
     bool is_leaf_estimate = false, irreducible = false;
     int bb_count = 0;

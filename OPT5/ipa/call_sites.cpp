@@ -6,6 +6,7 @@
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/loops.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -70,6 +71,12 @@ bool arguments_fit_parameters(const NODE* call, const SYMTAB* callee) {
 }
 
 // ---- Collecting
+
+int register_pressure_for_block(const BBLK* bb) {
+    BITVEC live(static_cast<uint32_t>(currfuninfo->lva_sym_count));
+    add_live_at_exit(bb, live);
+    return static_cast<int>(live.count());
+}
 
 namespace {
 

@@ -164,6 +164,7 @@ extern std::unique_ptr<INLINER> inliner;
 
 // ---- Collecting (call_sites.cpp)
 
+int register_pressure_for_block(const BBLK* bb); // live variables at its end; needs fact::live_variables
 // The sites of the current function, with what is known of their blocks. Without `pressure_of` no pressure is measured.
 void collect_call_sites(INLINE_FILE& file, int (*pressure_of)(const BBLK*) = nullptr);
 void measure_sizes(); // estimates of the current function, before anything is expanded

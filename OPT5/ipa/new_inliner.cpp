@@ -45,12 +45,6 @@ int32_t wrapped_product(int a, int b) { return static_cast<int32_t>(static_cast<
 
 // ---- Measures of the current function
 
-int live_variables_at(const BBLK* bb) {
-    BITVEC live(static_cast<uint32_t>(currfuninfo->lva_sym_count));
-    add_live_at_exit(bb, live);
-    return static_cast<int>(live.count());
-}
-
 bool is_irreducible() {
     const NATURAL_LOOPS& loops = *currfuninfo->loops;
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
@@ -162,7 +156,7 @@ void NEW_INLINER::measure() {
     f->irreducible = is_irreducible();
     f->est_pressure = 0;
     for (const BBLK* bb = f->bb_list; bb; bb = bb->dflink)
-        f->est_pressure = std::max(f->est_pressure, static_cast<uint32_t>(live_variables_at(bb)));
+        f->est_pressure = std::max(f->est_pressure, static_cast<uint32_t>(register_pressure_for_block(bb)));
     initialize_CFG_profiling_annotation(true, false);
     if (f->profile_status == 0) set_frequencies();
     measure_density(false);
@@ -172,7 +166,7 @@ void NEW_INLINER::collect_pass_1_info(INLINE_FILE& file) {
     std::vector<std::pair<double, double>> frequencies; // of passes behind this one
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) frequencies.emplace_back(bb->dFreqIn, bb->dFreqOut);
     measure();
-    collect_call_sites(file, live_variables_at);
+    collect_call_sites(file, register_pressure_for_block);
     auto old = frequencies.begin();
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink, ++old) {
         bb->dFreqIn = old->first;

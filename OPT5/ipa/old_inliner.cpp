@@ -2,6 +2,7 @@
 #include "OPT5/ipa/inliner.h"
 
 #include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "UTIL/abort.h"
 
@@ -68,7 +69,9 @@ void measure_sizes() {
 
 void OLD_INLINER::collect_pass_1_info(INLINE_FILE& file) {
     measure_sizes();
-    collect_call_sites(file);
+    const bool shows_pressure = inline_commentary_is_on(); // it decides nothing
+    if (shows_pressure) need(fact::live_variables);
+    collect_call_sites(file, shows_pressure ? register_pressure_for_block : nullptr);
 }
 
 SITE_PREDICATE OLD_INLINER::static_inlining_predicate() {

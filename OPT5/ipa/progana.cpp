@@ -4,6 +4,11 @@
 
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/walks.h"
+
+#include <algorithm>
+#include <cstring>
+#include <iterator>
 
 namespace {
 
@@ -29,6 +34,21 @@ bool may_be_copied(const SYMTAB* s, uint64_t* wide) {
     }
 }
 
+// A call that is about the frame of the function that makes it: where it returns to again, or what is freed with it.
+bool is_about_its_frame(const NODE* t) {
+    constexpr const char* names[] = {"setjmp", "_setjmp", "sigsetjmp", "__sigsetjmp", "alloca", "__builtin_alloca"};
+    const FUNINFO* callee = op_is_call(t->op) ? find_FUNINFO_for_call(t) : nullptr;
+    return callee && std::any_of(std::begin(names), std::end(names), [callee](const char* name) {
+               return !std::strcmp(skip_name_prefix(callee->name.c_str()), name);
+           });
+}
+
+bool needs_its_own_frame(const FUNINFO* f) {
+    bool found = false;
+    for_each_tree(f, [&found](const NODE* tree) { found = found || any_subtree(tree, is_about_its_frame); });
+    return found;
+}
+
 } // namespace
 
 // A function that was asked to be inlined may have any amount of locals.
@@ -39,6 +59,7 @@ void check_integrable_definition() {
     bool may = true;
     for (const SYMTAB* list : {f->new_syms, f->pending_syms, f->scalar_syms, f->memory_syms})
         for (const SYMTAB* s = list; s && may; s = s->next) may = may_be_copied(s, &wide);
+    if (needs_its_own_frame(f)) may = false;
     if (!may || (!asked_for && wide > WIDE_LOCALS_LIMIT)) set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
 }
 

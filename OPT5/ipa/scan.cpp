@@ -206,7 +206,9 @@ private:
         tree(t->left, false);
     }
 
+    // Nothing needs the value of a call without one, wherever it stands.
     void call(NODE* t, bool value_unused) {
+        value_unused = value_unused || t->type->is_void();
         delete t->call;
         t->call = new CALL_RECORD{f, f->unique_call_index++, 0};
         FUNINFO* callee = nullptr;

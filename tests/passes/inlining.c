@@ -30,7 +30,7 @@ static long s_long(long a) { return a * 70000; }
 static signed char s_char(int a) { return (signed char)a; }
 static int s_no_value(int a) { if (a > 0) return 3; g = a; }
 static void s_void(int a) { g += a; }
-static inline void s_void_too(int a) { g += a; }
+static void s_void_too(int a) { g += a; }
 
 struct pair { int a; long b; };
 static struct pair s_pair(int a) { struct pair p; p.a = a; p.b = a * 3L; return p; }

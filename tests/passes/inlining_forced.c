@@ -34,6 +34,10 @@ static inline int in_table(int a) { return a - 1; }
 int (*const table[])(int) = {in_table};
 static inline int of_inline(int a) { return by_word(a) + plain(a); }
 static int old(a, b) int a; int b; { return a - b; }
+int setjmp(long *);
+void *alloca(unsigned long);
+static int returns_again(int a) { static long place[8]; return setjmp(place) + a; }
+static int takes(int a) { int *p = alloca(a); return p[a - 1] = a; }
 
 // FUNCTION: asked
 // COUNT 0: by_word(
@@ -103,6 +107,16 @@ int below(int x) {
     h = two(x);
     return h;
 }
+// What a function has in its frame by a call stays there.
+// FUNCTION: frames
+// COUNT 1: _returns_again(
+// COUNT 1: _takes(
+int frames(int x) {
+    if (x < 100) return x;
+#pragma FORCEINLINE
+    h = returns_again(x) + takes(x);
+    return h;
+}
 // FUNCTION: main
 int main(void) {
     int i;
@@ -116,6 +130,7 @@ int main(void) {
         put_i32(all_below(i * 4));
         put_i32(both(i * 4));
         put_i32(below(i));
+        put_i32(frames(i));
         put_i32(table[0](i) + in_table(i) + of_inline(i));
     }
     return 0;

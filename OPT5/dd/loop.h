@@ -22,6 +22,7 @@
 #include <memory>
 #include <set>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 class SYMTAB;
@@ -135,8 +136,10 @@ struct LOOP {
     SYM_SET ALT_syms;     // changed
     std::vector<SYMTAB*> IV_syms;
     LOOPIV* LCV = nullptr;  // of `IVs`
-    LOOPIV* VLCV = nullptr; // of `IVs`
+    LOOPIV* VLCV = nullptr; // of `IVs`: the count of iterations from 0
+    std::unique_ptr<SYMTAB> virtual_symbol; // its, on no list of the function
     std::vector<std::unique_ptr<LOOPIV>> IVs;
+    std::unordered_map<const SYMTAB*, LOOPIV*> record_of; // those of `IVs`; looked up alone
     std::vector<LOOPLV> LVs;
     NODE* trips = nullptr; // executions of the tail for each entry; an ICON where exact
     NODE *tripFactor = nullptr, *maxTrips = nullptr, *minTrips = nullptr; // ICONs, null before they are asked for
@@ -162,6 +165,10 @@ struct LOOP {
     int32_t reg_pressure = 0, predicatePressure = 0, live2longs = 0, interruptLimit = 0;
     int32_t Xpaths = 0, Tpaths = 0, longReads = 0, longWrites = 0;
 
+    LOOP() = default;
+    LOOP(const LOOP&) = delete; // copies are deep: make_LOOP
+    LOOP& operator=(const LOOP&) = delete;
+    ~LOOP();
     bool has(uint32_t bits) const { return (flags & bits) != 0; }
     bool is_root() const { return parent == nullptr; }
     bool is_bottom_tested() const; // the tail ends in an IF, one target of which is the head
@@ -175,6 +182,11 @@ void for_each_subloop(const struct LOOP* l, F&& visit); // those directly in it,
 // `full`: with replication of tests and ranges by subscripts; `scalars`: with forwarding in loops; `simplify`: loops that
 // can be decided fold. `requireLoops` nonzero: a function without back edges gets no hierarchy; below 0: as `full`.
 void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoops);
+// What the build calls of the rooms above; null until they are there.
+struct LOOP_WORK {
+    void (*propagate_values)() = nullptr;
+};
+extern LOOP_WORK loop_work;
 // The tree alone, for who needs the nesting: no symbols, no pragmas taken.
 void build_minimal_loop_hierarchy(bool requireLoops);
 void unbuild_loop_hierarchy(); // pragmas go back to their preheaders first
@@ -183,12 +195,13 @@ void erase_loop_and_subloops(struct LOOP* loop);
 struct LOOP* loop_root(); // of the current function; null without a hierarchy
 // A new record, or a deep copy of `model` without its links to other loops; `uid` below 0 keeps the model's.
 std::unique_ptr<struct LOOP> make_LOOP(BBLK* head, BBLK* tail, int uid, const struct LOOP* model);
-void add_exit_blocks(struct LOOP* loop);
+void add_exit_blocks(struct LOOP* root);
 void assign_loop_levels(struct LOOP* loop, int level);
 void assign_loop_numbers(struct LOOP* loop, int number);
 void ensure_proper_preheader_for_loop(struct LOOP* loop);
 void sort_loop_contents_into_DFO(struct LOOP* loop);
 void rebind_clones(struct LOOP* root);
+void erase_loop_pragmas(struct LOOP* loop); // what the record holds
 struct LOOP* innermost_common_loop(struct LOOP* a, struct LOOP* b);
 bool loop_is_subloop_of_loop(const struct LOOP* inner, const struct LOOP* outer, bool or_same);
 bool loop_has_subloops(const struct LOOP* loop);
@@ -246,6 +259,10 @@ NODE* eval_expr_for_2nd_iteration(const NODE* expr, struct LOOP* loop);
 // What the symbol holds at the end of the block, as a new tree of values that hold there too, or null. `budget`: statements
 // looked at; `depth`: definitions looked through.
 NODE* find_symbol_value(SYMTAB* sym, BBLK* at_end_of, struct LOOP* loop, int budget, int depth);
+// What the search finds out of the function is kept from one question to the next between `keep_symbol_values(true)` and
+// (false); whoever changes statements or blocks in between says so.
+void keep_symbol_values(bool keep);
+void forget_symbol_values();
 NODE* find_expr_init(const NODE* expr, struct LOOP* loop); // a new tree, in values at the end of the loop's preheader
 BBLK* find_dominator_bb(BBLK* bb); // the block looked at before `bb`, or null; over whole loops
 BBLK* find_dominator_bb_for_sym(BBLK* bb, SYMTAB* sym, INT65* adjustment);
@@ -300,7 +317,6 @@ void validate_MUST_ITERATE_pragma(NODE* pragma);
 void reconcile_PROB_ITERATE_pragma(struct LOOP* loop);
 void update_pragmas_for_loop(struct LOOP* loop, int factor);
 void delete_pragmas_for_loop(struct LOOP* loop);
-void erase_loop_pragmas(struct LOOP* loop); // what the record holds
 
 // ---- Inline
 

@@ -8,4 +8,3 @@ void validate_MUST_ITERATE_pragma(NODE*) {}
 void reconcile_PROB_ITERATE_pragma(struct LOOP*) {}
 void update_pragmas_for_loop(struct LOOP*, int) {}
 void delete_pragmas_for_loop(struct LOOP*) {}
-void erase_loop_pragmas(struct LOOP*) {}

@@ -37,7 +37,7 @@ void begin(bool force) {
     widen_user_variables();
     split_qualified_parameter_copies();
     normalize_statements();
-    if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, true);
+    if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, 1);
 }
 
 void end() {

@@ -1,6 +1,7 @@
 #include "OPT5/driver/pipeline.h"
 
 #include "OPT5/driver/driver.h"
+#include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -31,7 +32,7 @@ void announce(const char* word, const ROW& row, const std::string& label) {
 
 void validate_current_function(const ROW& row, const std::string& label) {
     if (!current_function_has_blocks()) return;
-    const int errors = validate_cfg() + validate_stmts() + validate_grammar() + validate_facts();
+    const int errors = validate_cfg() + validate_stmts() + validate_grammar() + validate_facts() + validate_loop_hierarchy();
     if (errors == 0) return;
     const std::string text = label + " '" + row.name + "' left " + std::to_string(errors) + " errors";
     abort_optimizer(text.c_str());

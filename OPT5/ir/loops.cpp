@@ -114,9 +114,11 @@ void NATURAL_LOOPS::mark_irreducible() {
         rest = rest->rest;
         if (state[slot(to)] == UNSEEN)
             open(to);
-        else if (state[slot(to)] == OPEN && !dominates(to, from))
+        else if (state[slot(to)] == OPEN && !dominates(to, from)) {
+            other_cycles = true;
             for (NATURAL_LOOP* loop = innermost[slot(to)]; loop; loop = loop->parent)
                 if (contains(loop, from)) loop->is_reducible = false;
+        }
     }
 }
 

@@ -31,6 +31,8 @@ public:
     bool contains(const NATURAL_LOOP* loop, const BBLK* bb) const;
     // Of blocks that the graph had at construction.
     bool dominates(const BBLK* a, const BBLK* b) const;
+    // Whether there is a cycle that is no natural loop: it is entered in two places.
+    bool has_other_cycles() const { return other_cycles; }
     bool dominates_latches(const BBLK* bb, const NATURAL_LOOP* loop) const;
 
     // The block whose one successor is the header, and which every entry of the loop passes. Made if there is none: the
@@ -51,4 +53,5 @@ private:
     std::vector<int> first, last;         // numbers of the walk over the dominator tree, by block
     std::vector<NATURAL_LOOP*> innermost; // by block
     bool split = false;
+    bool other_cycles = false;
 };

@@ -1,0 +1,96 @@
+// A loop that is tested on top gets its test at the bottom too; the one on top becomes a guard ahead of the loop.
+//
+//     head: if (i < n) goto body; else goto exit;        if (i < n) goto preheader; else goto exit;
+//     body: ... goto head;                               preheader: body: ... if (i < n) goto body; else goto exit2;
+//
+// Needs: the hierarchy with its variables. Leaves: a graph for which the hierarchy is built anew.
+// Sound because the copies compute what the head computes, in the same order.
+#include "OPT5/dd/dd.h"
+#include "OPT5/dd/loop.h"
+
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/simp/simp.h"
+
+namespace {
+
+constexpr int MOST_TEST_NODES = 64;
+
+// Besides its test the head may hold one statement.
+bool head_is_small(const BBLK* head) {
+    const LIST* s = head->statements;
+    if (s->rest) {
+        if (s->first->op == PPRAGMA || s->first->op == ASM || tree_is_arg_prolog(s->first) || tree_contains_op(s->first, ASM) ||
+            tree_contains_op(s->first, CALL) || tree_contains_op(s->first, UCALL) || count_nodes_in_tree(s->first) > MOST_TEST_NODES)
+            return false;
+        s = s->rest;
+    }
+    return !s->rest && s->first->op == IF && s->first->left->op != ENDLOOP && count_nodes_in_tree(s->first->left) <= MOST_TEST_NODES;
+}
+
+bool has_shape(const struct LOOP* loop) {
+    const BBLK *head = loop->head, *tail = loop->tail;
+    return head != tail && tail->loop == loop && !tail->successors->rest && tail->branch()->op == BRANCH &&
+           edge_length(head->predecessors) == 2 && edge_length(head->successors) == 2 && head_is_small(head);
+}
+
+// Of the condition: a comparison of what moves in the loop with what stays; the side that stays, or null.
+NODE** staying_side(NODE* condition, const struct LOOP* loop) {
+    if (!op_is_int_compare(condition->op) || tree_has_side_effects(condition) || tree_is_RC_in_loop(condition, loop, false)) return nullptr;
+    for (const NODE* side : {condition->left, condition->right})
+        if (!side->type->is_int() && !side->type->is_pointer() && !side->type->is_enum()) return nullptr;
+    auto stays = [loop](const NODE* t) { return tree_is_RC_in_loop(t, loop, true); };
+    auto moves = [loop](const NODE* t) { return !tree_is_RC_in_loop(t, loop, false); };
+    if (moves(condition->left) && stays(condition->right)) return &condition->right;
+    return moves(condition->right) && stays(condition->left) ? &condition->left : nullptr;
+}
+
+// What stays is computed once, in the guard, if that takes an operation that the loop would repeat.
+void keep_in_temporary(NODE** side, const struct LOOP* loop) {
+    if (count_nodes_in_tree(*side, true) == 0 || expr_is_constant(*side) || !tree_is_RC_in_loop(*side, loop, false)) return;
+    SYMTAB* sym = sym_temp('T', -1, (*side)->type->stqs(), (*side)->ls);
+    BBLK* head = loop->head;
+    LIST** link = &head->statements;
+    while ((*link)->rest) link = &(*link)->rest;
+    insert_before(link, mk_ASG(mk_NAME(sym), *side), (*link)->psn);
+    *side = mk_NAME(sym);
+}
+
+// The tail gets the head's first statement, if that has two, and a copy of its test in place of the branch.
+void copy_test_to_tail(struct LOOP* loop, BBLK* body, BBLK* exit) {
+    BBLK *head = loop->head, *tail = loop->tail;
+    NODE** side = staying_side(head->branch()->left, loop);
+    debug_printf("\n\tReplicating WHILE loop test (loop #%d):\n\t%s\n\n", loop->uid, tree_to_infix(head->branch()->left).c_str());
+    if (head->statements->rest) insert_at_end_of_body(tail, copy_tree(head->statements->first));
+    keep_in_temporary(side, loop);
+    LIST* last = tail->last_statement();
+    erase_tree(last->first);
+    last->first = copy_tree(head->branch());
+    change_successors(tail, {{head, body}});
+    connect(tail, exit);
+    edges_were_changed(currfuninfo);
+    debug_printf("\n\tNew WHILE loop:\n\n");
+}
+
+bool replicate(struct LOOP* loop) {
+    if (!has_shape(loop) || !staying_side(loop->head->branch()->left, loop)) return false;
+    const NODE* targets = loop->head->branch()->right;
+    BBLK *yes = targets->left->lbl->bblock, *no = targets->right->lbl->bblock;
+    const bool yes_stays = loop_is_subloop_of_loop(yes->loop, loop, true), no_stays = loop_is_subloop_of_loop(no->loop, loop, true);
+    if (yes_stays == no_stays) return false;
+    copy_test_to_tail(loop, yes_stays ? yes : no, yes_stays ? no : yes);
+    return true;
+}
+
+} // namespace
+
+bool replicate_while_tests(struct LOOP* root) {
+    bool changed = false;
+    for (struct LOOP* loop : loops_inner_first(root))
+        if (!loop->is_root()) changed |= replicate(loop);
+    return changed;
+}

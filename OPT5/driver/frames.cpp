@@ -2,6 +2,7 @@
 // builds the loop hierarchy; the second half brings the trees back and simplifies them.
 #include "OPT5/driver/frames.h"
 
+#include "DEBUG_DISABLE/register_option.h"
 #include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
@@ -15,6 +16,9 @@
 #include "OPT5/simp/simp.h"
 
 namespace {
+
+// Until what is known of loops reaches the output again, the hierarchy is built on request.
+register_option pass_debug_hierarchy("debug:hierarchy");
 
 bool has_hierarchy() { return currfuninfo->bb_list && currfuninfo->bb_list->loop; }
 
@@ -37,7 +41,7 @@ void begin(bool force) {
     widen_user_variables();
     split_qualified_parameter_copies();
     normalize_statements();
-    if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, 1);
+    if (pass_debug_hierarchy && (force || !has_hierarchy())) build_loop_hierarchy(force, false, force, 1);
 }
 
 void end() {

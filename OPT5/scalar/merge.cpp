@@ -698,6 +698,7 @@ void merge_symbols() {
             merge.run();
             break;
         }
+    hoist_invariants(loops);
     if (loops.has_split_edges()) renumber_bblocks();
     changed(fact::none);
 }

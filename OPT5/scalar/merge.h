@@ -2,6 +2,7 @@
 // do. `rename_symbols` and `clone_symbol` are in rename.cpp, `eliminate_single_use_temps` in single_use.cpp, the rest in merge.cpp.
 #pragma once
 
+class NATURAL_LOOPS;
 class SYMTAB;
 
 void rename_symbols();
@@ -12,6 +13,9 @@ SYMTAB* clone_symbol(SYMTAB* sym, int n);
 
 // Computes the value of a variable that is set once and read once where it is read. The bits of the candidates stand.
 void eliminate_single_use_temps();
+
+// Computes ahead of each loop what its iterations would compute alike (invariants.cpp).
+void hoist_invariants(NATURAL_LOOPS& loops);
 
 // The pointers of the current function that a use of them has an offset to: their steps cannot all ride on accesses, which
 // the propagation of increments, not built yet, is to ask.

@@ -129,7 +129,7 @@ long tested_late(unsigned long u, unsigned long n) {
 }
 
 // FUNCTION: kept_volatile
-// COUNT 0: $O$P
+// COUNT 0: $O$P0 +=
 long kept_volatile(int n) {
     long s = 0;
     for (volatile int i = 0; i < n; i++) s += w[i];
@@ -138,7 +138,7 @@ long kept_volatile(int n) {
 
 // A call may change it.
 // FUNCTION: kept_aliased
-// COUNT 0: $O$P
+// COUNT 0: $O$P0 +=
 static void twice(int *i) { ++*i; }
 long kept_aliased(int n) {
     long s = 0;
@@ -286,6 +286,42 @@ long not_beside(const int *p, int n, unsigned u, int k) {
     return s;
 }
 
+// What no iteration changes is computed ahead of the loop, from the outermost one on; the address of an array only where
+// something varies is added to it. It may overflow where it was not computed before: then in the unsigned type.
+// FUNCTION: invariant
+// HAS: /^[$]O[$]P\d+ = &_b$/
+// HAS: $O$N1 = (int)((unsigned int)k * 3) ^ n
+// HAS: $O$N2 = (int)((unsigned int)_g + 2)
+// HAS: L1:
+// COUNT 1: &_b
+int g = 5;
+int invariant(int n, int k) {
+    int s = 0;
+    for (int i = 0; i < n; i++)
+        for (int j = i; j < 20; j += 3)
+            if (s & 8) s += b[s & 63] * (k * 3 ^ n);
+            else s ^= b[s & 31] + (g + 2);
+    return s;
+}
+
+// Not what it changes, by name or through a pointer, and nothing that may fail.
+// FUNCTION: variant
+// HAS: s = 0
+// COUNT 1: k * 5
+// COUNT 1: _g + 3
+// COUNT 1: n / k
+// COUNT 0: $O$N
+int variant(int n, int k, int *p) {
+    int s = 0;
+    for (int i = 0; i < n; i++) {
+        if (s & 1) s += n / k;
+        s += (k * 5) ^ (g + 3);
+        k += s & 1;
+        *p = i;
+    }
+    return s;
+}
+
 int main(void) {
     for (int i = 0; i < 300; i++) a[i] = i ^ 5, b[i] = 300 - i;
     for (int i = 0; i < 64; i++) w[i] = i * 7L, next[i] = i % 3 + 1, m[i / 8][i % 8] = i;
@@ -309,6 +345,7 @@ int main(void) {
     settled(2, 20, 5);
     put_i32(w[19] ^ m[2][3]);
     for (int n = 0; n < 4; n++) put_i32(beside(a + 9, w + 9, n, n) ^ not_beside(a + 9, n, n + 60, n * 3));
+    put_i16(invariant(9, 30000) ^ invariant(0, 32767) ^ variant(7, 0, &g) ^ variant(3, 2, a));
     put_i16(together(a, 9) + together(a, 0) + apart(a, 5));
     return 0;
 }

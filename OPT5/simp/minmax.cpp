@@ -270,14 +270,37 @@ static NODE* minmax_of_widened(const NODE* t, struct LOOP* loop) {
     return call ? coerced(wide, simp_node(call, loop), loop) : nullptr;
 }
 
+// Arms that were narrowed for the result, where the wide values are compared: narrowed behind the choice. A new tree in
+// the wide type, or null.
+static NODE* wide_arm(const NODE* arm, TYPE* wide) {
+    if (is_icon(arm) && truncate_to_type(arm->u.lval, wide) == arm->u.lval) return mk_ICON(arm->u.lval, wide);
+    const bool narrowed = arm->op == SCONV && same_integers(arm->left->type, wide) && !is_bitfield_access(arm->left);
+    return narrowed ? copy_tree(arm->left) : nullptr;
+}
+
+static NODE* minmax_of_narrowed(const NODE* t, struct LOOP* loop) {
+    TYPE *wide = t->left->left->type->stqs(), *narrow = t->type->stqs();
+    if (!is_integer(narrow) || !is_integer(wide) || narrow->size >= wide->size || narrow->is_bool()) return nullptr;
+    NODE *a = wide_arm(t->right->left, wide), *b = wide_arm(t->right->right, wide);
+    if (!a || !b || (is_icon(a) && is_icon(b))) {
+        erase_tree(a);
+        erase_tree(b);
+        return nullptr;
+    }
+    NODE* choice = maketree(QUEST, copy_tree(t->left), maketree(COLON, a, b, wide), wide);
+    NODE* call = minmax_of_QUEST(choice, loop);
+    if (!call) erase_tree(choice);
+    return call ? coerced(narrow, call, loop) : nullptr;
+}
+
 NODE* minmax_of_QUEST(NODE* t, struct LOOP* loop) {
     NODE *c = t->left, *a = t->right->left, *b = t->right->right;
     if ((!op_is_int_compare(c->op) && !op_is_float_compare(c->op)) || !is_pure(t)) return nullptr;
     NODE* call = make_minmax(c, a, b, t->type);
     if (call)
         call = simp_node(call, loop);
-    else
-        call = minmax_of_widened(t, loop);
+    else if (!(call = minmax_of_widened(t, loop)))
+        call = minmax_of_narrowed(t, loop);
     if (!call && op_is_int_compare(c->op)) return clamp_of_QUEST(t, loop);
     if (!call) call = float_clamp_of_QUEST(t, loop);
     if (!call) return nullptr;

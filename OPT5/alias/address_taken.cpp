@@ -39,6 +39,16 @@ void unmark_globals() {
     marked_globals.clear();
 }
 
+// Whether an indirection is the whole object at its address: in normal form that is how memory is named.
+bool is_object_itself(const NODE* t) {
+    const NODE* address = t->left;
+    if (trees_are_normalized && address->op == PCONV) address = address->left; // a name of another type than its object
+    if (t->right || address->op != UAND || address->left->op != NAME || !address->left->u.sym) return false;
+    const TYPE* object = address->left->u.sym->type;
+    if (is_plain_array(object)) return false;
+    return trees_are_normalized ? object->size == t->type->size : compatible_types(object, t->type, true);
+}
+
 // `is_access_address`: `t` is the pointer of an access, from which the object can be told.
 void mark_addressed(const NODE* t, bool is_access_address) {
     while (t) {
@@ -53,6 +63,7 @@ void mark_addressed(const NODE* t, bool is_access_address) {
                 if (side->op != NAME) mark_addressed(side, false);
             return;
         case UMULT:
+            if (is_object_itself(t)) return;
             mark_addressed(t->right, false);
             is_access_address = t->left->type->is_pointer();
             t = next;

@@ -4,9 +4,16 @@
 class NODE;
 struct LOOP; // written out where it is used: an opcode has the same name
 
-// The normal form that loop work runs on. Both consume the tree and return what it became.
-NODE* normalize_tree(NODE* tree, NODE* statement);
+// The normal form that loop work runs on (normal_form.cpp). Trees are consumed; what they became is returned.
+NODE* normalize_tree(NODE* tree, NODE* statement); // a part of the statement, or all of it
+// `keep_ddnodes`: a reference with a dependence record comes out under a DDNODE, which has the record then.
 NODE* denormalize_tree(NODE* tree, bool keep_ddnodes);
+// The integer terms of a pointer go to the right operand of the indirection it is of; what is left of it. Not null.
+NODE* partition_pointer_under_UMULT(NODE* pointer, NODE* umult);
+NODE* strip_ddep_info_from_tree(NODE* tree); // records of dependence and DDNODEs go
+// All statements of the current function; `trees_are_normalized` tells the form that they have.
+void normalize_all_trees();
+void denormalize_all_trees(bool keep_ddnodes, bool simplify);
 
 // A parameter copy of the argument prolog that copies a scalar with a qualifier that bars optimization is split: a
 // local without the qualifier takes the value.

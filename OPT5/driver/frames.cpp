@@ -22,35 +22,32 @@ register_option pass_debug_hierarchy("debug:hierarchy");
 
 bool has_hierarchy() { return currfuninfo->bb_list && currfuninfo->bb_list->loop; }
 
-void normalize_statements() {
-    init_dd_aliasing();
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s; s = s->rest) s->first = normalize_tree(s->first, s->first);
-    trees_are_normalized = true;
-}
-
-void denormalize_statements() {
-    trees_are_normalized = false;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s; s = s->rest) s->first = simp_tree(denormalize_tree(s->first, false), nullptr);
-}
+void denormalize_and_simplify() { denormalize_all_trees(false, true); }
 
 void begin(bool force) {
     if (!has_hierarchy()) simpcfg(0, 0);
     do_dd_for_be = false;
     widen_user_variables();
     split_qualified_parameter_copies();
-    normalize_statements();
+    normalize_all_trees();
     if (pass_debug_hierarchy && (force || !has_hierarchy())) build_loop_hierarchy(force, false, force, 1);
 }
 
 void end() {
-    denormalize_statements();
+    denormalize_and_simplify();
     widen_user_variables();
     changed(fact::graph);
 }
 
 } // namespace
+
+void drop_hierarchy() {
+    if (!has_hierarchy()) return;
+    reinsert_loop_pragmas(currfuninfo->bb_list->loop);
+    erase_loop_hierarchy();
+    rebuildcfg();
+    simpcfg(0, 0);
+}
 
 const FRAME D = {[] { begin(false); }, end};
 const FRAME D_with_dependence = {[] {
@@ -62,4 +59,15 @@ const FRAME D_with_dependence = {[] {
                                      end();
                                  }};
 const FRAME DF = {[] { begin(true); }, end};
-const FRAME N = {normalize_statements, denormalize_statements};
+const FRAME D_where_loops_are = {[] {
+                                     if (L2()) begin(false);
+                                 },
+                                 [] {
+                                     if (L2()) end();
+                                 }};
+const FRAME N = {normalize_all_trees, denormalize_and_simplify};
+const FRAME N_and_no_hierarchy = {normalize_all_trees, [] {
+                                      denormalize_and_simplify();
+                                      drop_hierarchy();
+                                      simpcfg(0, 0);
+                                  }};

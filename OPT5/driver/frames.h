@@ -9,5 +9,12 @@ extern const FRAME D;
 extern const FRAME D_with_dependence;
 // D with the full hierarchy built anew, whether there is one or not.
 extern const FRAME DF;
+// D from level 2 on, and nothing below.
+extern const FRAME D_where_loops_are;
 // Normal form alone.
 extern const FRAME N;
+// The same; behind it the hierarchy goes and the blocks are simplified.
+extern const FRAME N_and_no_hierarchy;
+
+// Pragmas go back to the statements, and the blocks are simplified, since no hierarchy is needed any more.
+void drop_hierarchy();

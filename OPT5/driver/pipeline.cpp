@@ -16,7 +16,7 @@
 namespace {
 
 register_option pass_debug_validate("debug:validate"), pass_debug_skip("debug:skip"), pass_debug_only("debug:only"),
-    pass_debug_list_rows("debug:list_rows");
+    pass_debug_list_rows("debug:list_rows"), pass_debug_idle_frames("debug:idle_frames");
 
 bool current_function_has_blocks() { return currfuninfo && currfuninfo->bb_list; }
 
@@ -38,11 +38,21 @@ void validate_current_function(const ROW& row, const std::string& label) {
     abort_optimizer(text.c_str());
 }
 
-void do_work(const ROW& row) {
-    if (row.kind == ROW::IDLE || (row.condition && !row.condition())) return;
-    if (row.frame) row.frame->begin();
-    if (row.needs) need(row.needs);
-    row.action();
+bool has_work(const ROW& row) {
+    if (row.kind == ROW::IDLE && !(row.frame && pass_debug_idle_frames)) return false;
+    return !row.condition || row.condition();
+}
+
+void do_work(const ROW& row, const std::string& label) {
+    if (!has_work(row)) return;
+    if (row.frame) {
+        row.frame->begin();
+        if (pass_debug_validate) validate_current_function(row, label + " at the begin of");
+    }
+    if (row.kind != ROW::IDLE) {
+        if (row.needs) need(row.needs);
+        row.action();
+    }
     if (row.frame) row.frame->end();
     if (currfuninfo) changed(row.leaves); // the last step leaves no current function
 }
@@ -59,7 +69,7 @@ void run_row(const ROW& row, const std::string& label, bool skip) {
     const bool timed = print_debug || enable_time_stats;
     const clock_t start = timed ? std::clock() : 0;
     FUNINFO* const funinfo = currfuninfo;
-    do_work(row);
+    do_work(row, label);
     if (timed) {
         const clock_t ticks = std::clock() - start;
         if (print_debug) debug_printf("(%.1f sec for pass.)\n", static_cast<double>(ticks) / CLOCKS_PER_SEC);

@@ -24,7 +24,7 @@ struct ROW {
         BARRIER, // once for the whole program, with no current function
         FIXED,   // of a function; the program is not one without it, so no switch takes it out
         // Of a function; its action changes nothing: what it calls is not built yet, or has no work on this target. The row is
-        // entered and dumped, its frame and its action are left out.
+        // entered and dumped, its frame and its action are left out; under `debug:idle_frames` its action alone.
         IDLE,
     };
     KIND kind;

@@ -159,16 +159,8 @@ void with_hierarchy(F work) {
     if (root()) work();
 }
 
-void drop_hierarchy_and_rebuild() {
-    reinsert_loop_pragmas(root());
-    erase_loop_hierarchy();
-    rebuildcfg();
-}
-
 void sink_definitions() {
-    if (!sink_unused_definitions(root())) return;
-    drop_hierarchy_and_rebuild();
-    simpcfg(0, 0);
+    if (sink_unused_definitions(root())) drop_hierarchy();
 }
 
 // Dependence analysis is active for as long as there is a hierarchy to collapse.
@@ -195,25 +187,6 @@ void loop_if_interchange() {
 // Only where the frame has built no hierarchy: building one has propagated values already.
 void value_propagation() {
     if (!root()) do_value_propagation();
-}
-
-// Behind the frame: the blocks may be simplified, since no hierarchy is needed any more.
-void promote_and_clean_up() {
-    N.begin();
-    promote_vars_to_registers(false);
-    N.end();
-    if (root()) {
-        drop_hierarchy_and_rebuild();
-        simpcfg(0, 0);
-    }
-    simpcfg(0, 0);
-}
-
-// Divisions are rewritten at every level; from level 2 on in the frame.
-void DIVs_by_ICONs() {
-    if (L2()) D.begin();
-    transform_DIVs_by_ICONs();
-    if (L2()) D.end();
 }
 
 void nothing() {}
@@ -286,10 +259,10 @@ const ROW steps[] = {
     /* 54 */ {L, "alias_advice", &D_with_dependence, L2, [] { report_ambiguous_aliases(root()); }, none, none},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {L, "value_propagation", &D, L2, value_propagation, none, none},
-    /* 57 */ {F, "DIVs_by_ICONs", nullptr, always, DIVs_by_ICONs, none, graph},
+    /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph},
     /* 58 */ {L, "SSA_propagate_vector", &D, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(3); }); }, none, none},
     /* 59 */ {L, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, none},
-    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", nullptr, L2, promote_and_clean_up, none, graph},
+    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_vars_to_registers(false); }, none, graph},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
     /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},

@@ -101,6 +101,13 @@ void check_integer(const NODE* t, const char* what) {
     if (!t->type->is_int() && !t->type->is_enum()) refuse(std::string(what) + " of type " + t->type->printstr());
 }
 
+// Base and subscript are apart in normal form alone.
+void check_subscript(const NODE* t) {
+    if (!in_graph || !trees_are_normalized) refuse("an indirection with a subscript outside of the normal form");
+    check(t->right, ROLE::value);
+    check_integer(t->right, "a subscript");
+}
+
 // What is true or false is a scalar, or a mask of truth values.
 void check_truth_value(const NODE* t) {
     if (!t->type->is_scalar() && !t->type->is_vector()) refuse("the truth of a " + t->type->printstr());
@@ -123,6 +130,7 @@ void check_operands(const NODE* t) {
     case UMULT:
         check(t->left, ROLE::value);
         check_pointer(t, "an indirection");
+        if (t->right) check_subscript(t);
         return;
     case STREF:
         check(t->left, ROLE::value);

@@ -82,6 +82,12 @@ N* access_of_place(N* t) {
     return t;
 }
 
+// The NAME that is accessed as a whole, in normal form through its address; null of another tree.
+inline const NODE* name_accessed(const NODE* t) {
+    if (t->op == UMULT && !t->right && t->left->op == UAND) t = t->left->left;
+    return t->op == NAME ? t : nullptr;
+}
+
 // The NAME that a place is, wholly or in part; null where it lies behind a pointer.
 template <class N>
 N* name_of_place(N* t) {

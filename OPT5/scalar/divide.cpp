@@ -25,6 +25,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lowering.h"
@@ -209,7 +210,7 @@ NODE* sequence_for(int op, const NODE* x, INT65 c, TYPE* type, INT65 low, INT65 
 bool is_repeatable(const NODE* x) {
     for (; x->op == SCONV; x = x->left) {
     }
-    return x->op == NAME && !lvalue_is_volatile(x);
+    return name_accessed(x) && !lvalue_is_volatile(x);
 }
 
 // The type that a DIV or MOD of integers by a constant computes in, or null.

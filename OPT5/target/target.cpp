@@ -79,7 +79,10 @@ NODE* cpu_bit_test_subtree(NODE* t) {
 long cost_for_DIV_to_MULT_expr(const NODE* t) {
     constexpr long COST_OF_DIV = 666;
     long cost = 0;
-    for (; t; t = t->left) cost += (t->op == DIV ? COST_OF_DIV : 1) + cost_for_DIV_to_MULT_expr(t->right);
+    for (; t; t = t->left) {
+        cost += (t->op == DIV ? COST_OF_DIV : 1) + cost_for_DIV_to_MULT_expr(t->right);
+        if (name_accessed(t)) break;
+    }
     return cost;
 }
 

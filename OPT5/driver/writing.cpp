@@ -4,6 +4,7 @@
 // settle what the output states of the function as it stands (registers, layout, exception table). The order is part of
 // their contract: no row behind "unsimplify" simplifies.
 #include "OPT5/driver/driver.h"
+#include "OPT5/driver/frames.h"
 #include "OPT5/driver/pipeline.h"
 
 #include "OPT5/cd/vectors.h"
@@ -65,6 +66,7 @@ ROWS rows_ahead_of_output() { return rows; }
 // call that is written later may bring it back.
 void output_function() {
     if (is_written()) {
+        drop_hierarchy(); // of an order of steps that lacks the one behind which it is gone
         run_rows_ahead_of_output();
         write_function();
         erase_all();

@@ -13,7 +13,8 @@ A program may begin with comments that say how it is built:
   // parse: WORD...      words for the parser; a file name with .c is a further file of the unit, in this folder
   // optimize: WORD...   every level is taken with these words too; such a line may be repeated
 
-With --forms SEED each program is judged once a level as another parser might have written it (forms.py).
+With --forms SEED each program is judged once a level as another parser might have written it (forms.py), with the trees
+brought into the form of loop work and back at each step that will have work there.
 """
 import argparse
 import sys
@@ -28,7 +29,7 @@ from zbench import Outcome, Tools, Trouble, difference  # noqa: E402
 
 LEVELS = ("off", "0", "1", "2", "3", "4")
 SIZE_GOALS = ("0", "5")
-CHECK = "--debug:validate"
+CHECK, FRAMES = "--debug:validate", "--debug:idle_frames"
 EXPECTED = HERE / "expected.txt"
 SECTION = 16
 
@@ -115,7 +116,7 @@ def judge_program(tools, source, expected, levels, folder, forms=None):
     failures = []
     if forms is not None:
         for level in levels:
-            failures += judge_variant(tools, unit, want, f"level {level}", [f"--opt_level={level}", CHECK], [""])
+            failures += judge_variant(tools, unit, want, f"level {level}", [f"--opt_level={level}", CHECK, FRAMES], [""])
         return failures
     for name, words in variants(levels, directives(source, "optimize")):
         failures += judge_variant(tools, unit, want, name, words)

@@ -285,6 +285,21 @@ TYPE* type_of_address(const NODE* t, const NODE* base) {
     return tp->mk_ptr(target);
 }
 
+bool is_scaled(const NODE* t) {
+    return (t->op == MULT || t->op == PMCONV || t->op == SLL) && t->right && t->right->op == ICON;
+}
+
+// Rows and columns are added one by one, as they came: an address of a row serves all its columns.
+NODE* moved(NODE* base, int op, NODE* term, TYPE* type, LS* ls) {
+    const bool is_sum = op == PLUS && (term->op == PLUS || term->op == MINUS) && is_as_wide_as_addresses(term->type);
+    if (!is_sum || !(is_scaled(term->left) || is_scaled(term->right))) return maketree(op, base, term, type, ls);
+    base = moved(base, PLUS, term->left, type, ls);
+    NODE* last = term->right;
+    const int last_op = term->op;
+    erase_node(term);
+    return maketree(last_op, base, last, type, ls);
+}
+
 void join_subscript(NODE* t) {
     NODE** base = &t->left;
     while ((*base)->op == OUIALIGN || (*base)->op == NONALIGN) base = &(*base)->left;
@@ -292,7 +307,7 @@ void join_subscript(NODE* t) {
     t->right = nullptr;
     LS* ls = t->left->ls;
     TYPE* type = type_of_address(t, *base);
-    *base = maketree(PLUS, *base, subscript, type, ls);
+    *base = moved(*base, PLUS, subscript, type, ls);
     for (NODE* mark = t->left; mark != *base; mark = mark->left) mark->type = type;
 }
 

@@ -296,6 +296,7 @@ void prop_scalars_in_loop(struct LOOP* loop, bool recurse, bool expand);
 void prop_IVs_and_RCs_in_loop(struct LOOP* loop, bool recurse);
 
 // ---- loop_assertions.cpp
+void install_loop_callbacks();                // once: what the rooms below ask of loops is answered here
 void find_loop_assertions(struct LOOP* loop); // and those in it; null: from the root
 void find_loop_assertions_for_loop(struct LOOP* loop);
 // Both consume the tree, which holds on entry to, or throughout, the loop; null loop: it is erased.
@@ -303,20 +304,39 @@ void add_loop_entry_assertion(NODE* tree, struct LOOP* loop);
 void add_loop_body_assertion(NODE* tree, struct LOOP* loop);
 
 // ---- loop_pragmas.cpp
+// Arguments are decimal text; one that is not there, or is no number, counts as absent.
 NODE* set_PPRAGMA_tree_info(NODE* tree, int number, const std::vector<std::string>& args); // null: a new one
 std::string get_PPRAGMA_tree_arg(const NODE* tree, int n); // empty where it has none
 void set_PPRAGMA_tree_arg(NODE* tree, int n, const std::string& text);
 INT65 get_PPRAGMA_tree_int_arg(const NODE* tree, int n, INT65 absent = INT65(0));
 void set_PPRAGMA_tree_int_arg(NODE* tree, int n, INT65 value);
-bool is_loop_pragma(int number);            // one that speaks of the loop that follows
-void take_loop_pragma(NODE* tree, struct LOOP* loop); // consumes the tree
-void reinsert_loop_pragmas(struct LOOP* loop);     // children first, into the preheaders
+bool is_loop_pragma(int number); // one that speaks of the loop that follows
+// Consumes the tree and enters it in the record. Of several pragmas the one nearest to the loop is taken first.
+void take_loop_pragma(NODE* tree, struct LOOP* loop);
+void reinsert_loop_pragmas(struct LOOP* loop); // of the loops in it too, into the preheaders
+INT65 no_trip_bound();                         // above every trip count; what no stated maximum counts as
+// The three arguments as numbers, in normal form: minimum, maximum (`no_trip_bound` without), multiple.
+struct ITERATE_PROMISE {
+    INT65 min, max, multiple;
+};
+ITERATE_PROMISE promise_of_MUST_ITERATE(const NODE* pragma);
 void try_to_make_MUST_ITERATE_pragma(struct LOOP* loop);
 void reconcile_MUST_ITERATE_pragma(struct LOOP* loop);
 void validate_MUST_ITERATE_pragma(NODE* pragma);
 void reconcile_PROB_ITERATE_pragma(struct LOOP* loop);
-void update_pragmas_for_loop(struct LOOP* loop, int factor);
+// Clips it to the known bounds of the trip count; one that says nothing then is erased.
+void clip_PROB_ITERATE_pragma(struct LOOP* loop);
+void update_pragmas_for_loop(struct LOOP* loop, int factor); // whose body was replicated
 void delete_pragmas_for_loop(struct LOOP* loop);
+// From the numbers of the record, unless the pragma is there.
+void set_PPRAGMA_READ_WRITE(struct LOOP* loop);
+void set_PPRAGMA_SP_HINDRANCES(struct LOOP* loop);
+void set_PPRAGMA_UNIT_RESOURCES(struct LOOP* loop);
+void set_PPRAGMA_II_ESTIMATE(struct LOOP* loop);
+void set_PPRAGMA_CONSTRAINT_FLAGS(struct LOOP* loop);
+void set_PPRAGMA_LOOP_FLAGS(struct LOOP* loop, unsigned flags);
+void set_PPRAGMA_TRIP_CNTR_MUNGED(struct LOOP* loop);
+void printIIpragmas(struct LOOP* loop); // of innermost loops, to the debug stream
 
 // ---- Inline
 

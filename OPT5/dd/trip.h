@@ -1,0 +1,46 @@
+// What the files that count trips share.
+#pragma once
+
+#include "OPT5/dd/loop.h"
+
+// Numbers of 65 bits and their products.
+using WIDE_INT = __int128;
+WIDE_INT wide_of(INT65 v);
+INT65 int65_of(WIDE_INT v); // of a value in its range
+
+// A new tree of values as they are written in statements.
+NODE* denormalized_copy(const NODE* tree);
+
+// Whether the exit test of the control variable would let the value on entry pass: so the guard of a bottom-tested loop,
+// or what is known of the values, says.
+bool first_test_holds(const struct LOOP* loop);
+
+// Visits the straight line of blocks that ends in the loop's preheader, the nearest first, for as long as `visit(block,
+// test, sense)` returns true: the line came through the side `sense` of the block's IF `test`, which is null for another
+// end and for the preheader.
+template <class F>
+void for_each_block_ahead(const struct LOOP* loop, F&& visit);
+
+// ---- Inline
+
+constexpr int MOST_BLOCKS_AHEAD = 16;
+
+template <class F>
+void for_each_block_ahead(const struct LOOP* loop, F&& visit) {
+    const BBLK* bb = loop->preheader;
+    if (!bb || !visit(bb, static_cast<const NODE*>(nullptr), false)) return;
+    for (int n = 0; n < MOST_BLOCKS_AHEAD; ++n) {
+        if (!bb->predecessors || bb->predecessors->rest) return;
+        const BBLK* before = bb->predecessors->first;
+        if (before->dfn >= bb->dfn) return;
+        const NODE* test = before->branch();
+        if (!test || test->op != IF || test->left->op == ENDLOOP) test = nullptr;
+        bool sense = false;
+        if (test) {
+            sense = test->right->left->lbl->bblock == bb;
+            if (sense == (test->right->right->lbl->bblock == bb)) test = nullptr;
+        }
+        if (!visit(before, test, sense)) return;
+        bb = before;
+    }
+}

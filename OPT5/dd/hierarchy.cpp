@@ -34,8 +34,7 @@ LOOP::~LOOP() {
     erase_loop_pragmas(this);
     for (NODE* t : {trips, tripFactor, maxTrips, minTrips})
         if (t) erase_tree(t);
-    if (parent)
-        for (NODE* t : givens) erase_tree(t); // the root's are the function's
+    for (NODE* t : givens) erase_tree(t);
 }
 
 namespace {
@@ -231,7 +230,6 @@ void hold(std::unique_ptr<HIERARCHY> made) {
     currfuninfo->hierarchy = made.release();
 }
 
-struct LOOP* parent_of(const struct LOOP* loop) { return loop->parent; }
 bool is_back_edge(const BBLK* from, const BBLK* to) { return to->loop && to->loop->head == to && to->loop->tail == from && !to->loop->is_root(); }
 void edge_was_split(BBLK* from, BBLK* middle, BBLK* to) {
     struct LOOP* loop = innermost_common_loop(from->loop, to->loop);
@@ -243,7 +241,7 @@ void edge_was_split(BBLK* from, BBLK* middle, BBLK* to) {
 }
 
 void install_callbacks() {
-    loop_callbacks.parent = parent_of;
+    install_loop_callbacks();
     loop_callbacks.is_back_edge = is_back_edge;
     loop_callbacks.edge_was_split = edge_was_split;
 }
@@ -258,7 +256,10 @@ void erase_loop_hierarchy() {
 }
 
 void unbuild_loop_hierarchy() {
-    if (struct LOOP* root = loop_root()) reinsert_loop_pragmas(root);
+    if (struct LOOP* root = loop_root()) {
+        for (struct LOOP* loop : loops_outer_first(root)) try_to_make_MUST_ITERATE_pragma(loop);
+        reinsert_loop_pragmas(root);
+    }
     erase_loop_hierarchy();
 }
 

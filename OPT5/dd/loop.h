@@ -151,7 +151,7 @@ struct LOOP {
     NODE *spConstraintPragma = nullptr, *iiEstimatePragma = nullptr, *unitResourcesPragma = nullptr;
     NODE *spHindrancesPragma = nullptr, *readWritePragma = nullptr;
     std::vector<NODE*> noAliasAdvice, aliasAdvice, alignAdvice, inlineAdvice;
-    std::vector<NODE*> givens; // conditions that hold throughout the loop; the root's are FUNINFO::givens
+    std::vector<NODE*> givens; // conditions that hold throughout the loop; those of FUNINFO outlive the hierarchy
     SOURCE_PLACE sourceStart, sourceEnd;
     uint32_t flags = 0;
     uint16_t uid = 0; // depth first from 0, the root

@@ -353,8 +353,9 @@ private:
 
     void pass_test(const BBLK* test, const BBLK* to) {
         NODE* t = test->branch();
+        if (!t || t->op == BRANCH) return;
         guard = nullptr;
-        if (!t || t->op != IF) return;
+        if (t->op != IF) return;
         const BBLK *on_true = t->right->left->lbl->bblock, *on_false = t->right->right->lbl->bblock;
         if (on_true == on_false) return;
         NODE* condition = copy_tree(t->left);
@@ -380,7 +381,7 @@ private:
 
     struct LOOP* const loop;
     std::vector<const NODE*> behind; // statements between the place of the walk and the loop, the last first
-    NODE* guard = nullptr; // the IF at the end of the block, if one side of it is the preheader
+    NODE* guard = nullptr; // the first IF behind the place of the walk, if one side of it is the preheader
     bool guard_chooses = false;
     bool of_others = false; // the pragmas further ahead
 };

@@ -460,7 +460,9 @@ void reinsert(struct LOOP* loop) {
         return;
     }
     if (loop->flags & WRITTEN_FLAGS) set_PPRAGMA_LOOP_FLAGS(loop, loop->flags);
-    if (loop->mustIterate && loop->is_bottom_tested() && !loop->has(LOOP_early_exit) &&
+    // A test that was just copied from the head leaves that as a guard behind the preheader.
+    const bool tests_last = end && end->op == IF && is_edge(loop->tail, loop->head);
+    if (loop->mustIterate && tests_last && !loop->has(LOOP_early_exit) &&
         get_PPRAGMA_tree_int_arg(loop->mustIterate, 0) <= INT65(0))
         set_PPRAGMA_tree_arg(loop->mustIterate, 0, "1");
     LIST** link = &loop->preheader->statements;

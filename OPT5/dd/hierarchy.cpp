@@ -256,10 +256,7 @@ void erase_loop_hierarchy() {
 }
 
 void unbuild_loop_hierarchy() {
-    if (struct LOOP* root = loop_root()) {
-        for (struct LOOP* loop : loops_outer_first(root)) try_to_make_MUST_ITERATE_pragma(loop);
-        reinsert_loop_pragmas(root);
-    }
+    if (struct LOOP* root = loop_root()) reinsert_loop_pragmas(root);
     erase_loop_hierarchy();
 }
 

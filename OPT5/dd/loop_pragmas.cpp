@@ -459,6 +459,7 @@ void reinsert(struct LOOP* loop) {
         erase_loop_pragmas(loop);
         return;
     }
+    try_to_make_MUST_ITERATE_pragma(loop);
     if (loop->flags & WRITTEN_FLAGS) set_PPRAGMA_LOOP_FLAGS(loop, loop->flags);
     // A test that was just copied from the head leaves that as a guard behind the preheader.
     const bool tests_last = end && end->op == IF && is_edge(loop->tail, loop->head);

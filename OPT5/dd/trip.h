@@ -3,6 +3,8 @@
 
 #include "OPT5/dd/loop.h"
 
+#include "OPT5/simp/linear.h"
+
 // Numbers of 65 bits and their products.
 using WIDE_INT = __int128;
 WIDE_INT wide_of(INT65 v);
@@ -14,6 +16,9 @@ NODE* denormalized_copy(const NODE* tree);
 // Whether the exit test of the control variable would let the value on entry pass: so the guard of a bottom-tested loop,
 // or what is known of the values, says.
 bool first_test_holds(const struct LOOP* loop);
+
+// Adds a multiple of the tree to the sum, by operators alone that give the number itself; false where that has no room.
+bool read_exact_sum(const NODE* tree, int64_t coefficient, LINEAR_FORM* sum);
 
 // Visits the straight line of blocks that ends in the loop's preheader, the nearest first, for as long as `visit(block,
 // test, sense)` returns true: the line came through the side `sense` of the block's IF `test`, which is null for another

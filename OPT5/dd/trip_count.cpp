@@ -199,6 +199,14 @@ std::optional<WIDE_INT> known_distance(const COUNTER& c, bool passes_on_entry) {
     return goes_up(c.op) ? up : up == 0 ? 0 : up - turn;
 }
 
+} // namespace
+
+bool read_exact_sum(const NODE* tree, int64_t coefficient, LINEAR_FORM* sum) {
+    return DISTANCE_READER(sum, false).read(tree, coefficient) && sum->is_exact;
+}
+
+namespace {
+
 // ---- Ends that the program computes
 
 // The value in a type that holds it, signed.

@@ -348,7 +348,21 @@ private:
     void assume(NODE* condition) {
         bool holds = !tree_has_side_effects(condition);
         for (size_t i = behind.size(); i > 0 && holds; --i) holds = !tree_modifies_lvalue_in_tree(behind[i - 1], condition);
+        if (holds && !tree_is_RC_in_loop(condition, loop, false)) condition = of_entry(condition);
         add_loop_entry_assertion(condition, holds ? loop : nullptr);
+    }
+
+    // With the values on entry of the loop's variables, which they have at the condition too.
+    NODE* of_entry(NODE* condition) {
+        for (const auto& iv : loop->IVs) {
+            if (!iv->has(IV_is_IV) || iv->has(IV_is_VLCV) || !iv->init || !iv->init->type->is_int() || !iv->sym->type->is_int() || !sym_appears_in_tree(iv->sym, condition))
+                continue;
+            NODE *name = mk_NAME(iv->sym), *value = coerce_to_type(iv->sym->type->stqs(), denormalize_tree(copy_tree(iv->init), false));
+            condition = subst_tree_for_lvalue_in_tree(value, name, condition);
+            erase_tree(name);
+            erase_tree(value);
+        }
+        return simp_for_control(condition, loop->parent);
     }
 
     void pass_test(const BBLK* test, const BBLK* to) {

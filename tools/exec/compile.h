@@ -109,6 +109,7 @@ private:
     std::unordered_map<uint32_t, uint32_t> labels;          // number to statement
     std::vector<TRIP_PROMISE> promised;                     // of the loop whose head comes next
     std::string keyword;                                    // and its keyword in the source
+    uint32_t loop = NO_LOOP;                                // the statements that come are in
 
     // compile_expr.cpp
     const XNODE* build(const IC_NODE* n);
@@ -164,8 +165,8 @@ private:
     STMT& add(STMT_KIND kind, uint32_t line);
     void switch_table();
     void define(uint32_t label);
-    void promise(const IC_ITEM& item);
     void exceptions(const IC_ITEM& item);
     uint32_t target(uint32_t label);
+    void promise(const PRAGMA& pragma);
     void resolve();
 };

@@ -43,6 +43,7 @@ STMT& COMPILER::add(STMT_KIND kind, uint32_t line) {
     f->code.emplace_back();
     f->code.back().kind = kind;
     f->code.back().line = line;
+    if (!f->loops.empty()) f->loop_of.resize(f->code.size(), loop);
     return f->code.back();
 }
 
@@ -58,15 +59,12 @@ void COMPILER::define(uint32_t label) {
     keyword.clear();
 }
 
-void COMPILER::promise(const IC_ITEM& item) {
+void COMPILER::promise(const PRAGMA& pragma) {
     TRIP_PROMISE t;
-    if (item.kind == IFR_LOOP) {
-        const uint32_t* word = item.facts->word;
-        if (make_promise(word[2], word[3] == UINT32_MAX ? 0 : word[3], word[4], t)) promised.push_back(t);
-    } else if (std::strcmp(item.pragma->name(), "MUST_ITERATE") == 0) {
-        if (read_promise(*item.pragma, t)) promised.push_back(t);
-    } else if (std::strcmp(item.pragma->name(), "SRC_LOOP") == 0 && item.pragma->args.size() > 3) {
-        keyword = item.pragma->args[3];
+    if (std::strcmp(pragma.name(), "MUST_ITERATE") == 0) {
+        if (read_promise(pragma, t)) promised.push_back(t);
+    } else if (std::strcmp(pragma.name(), "SRC_LOOP") == 0 && pragma.args.size() > 3) {
+        keyword = pragma.args[3];
     }
 }
 
@@ -206,9 +204,15 @@ void COMPILER::function() {
         case IFR_LABEL: define(item.number); break;
         case IFR_EHT_HEADER: exception_table = &item; break;
         case IFR_PRAGMA:
-        case IFR_LOOP:
-            if (p.options.check) promise(item);
+            if (p.options.check) promise(*item.pragma);
             break;
+        case IFR_LOOP:
+            if (p.options.check) {
+                const uint32_t* w = item.facts->word;
+                f->loops.push_back({w[0], w[1], w[2], w[3], w[4]});
+            }
+            break;
+        case IFR_LOOP_VAR: loop = item.facts->word[0]; break;
         case IFR_ASM:
             if (p.options.check && !is_comment(item.text)) {
                 STMT& s = add(S_FAIL, line);
@@ -222,6 +226,8 @@ void COMPILER::function() {
     add(S_URETURN, line);
     if (exception_table) exceptions(*exception_table);
     resolve();
+    const std::string fault = bind_loop_records(*f);
+    if (!fault.empty()) throw EXEC_ERROR{EXEC_TRIPS, fault + " (in " + f->name + ", line " + std::to_string(f->code.front().line) + ")"};
     find_promised_loops(*f);
     f->frame = (f->frame + 3) & ~uint64_t{3};
     f->depth = deepest;

@@ -38,6 +38,13 @@ public:
         while (at > order_of[a]) at = dominator[at];
         return at == order_of[a];
     }
+    // Whether each edge that leads back in reverse postorder leads to what dominates its source.
+    bool is_reducible() const {
+        for (uint32_t from : order)
+            for (uint32_t to : next[from])
+                if (order_of[to] <= order_of[from] && !dominates(to, from)) return false;
+        return true;
+    }
     std::vector<TARGETS> next, before;
 
 private:
@@ -86,13 +93,7 @@ private:
     std::vector<uint32_t> dominator; // by place in `order`
 };
 
-struct LOOP_BODY {
-    uint32_t head;
-    TARGETS latches;
-    std::vector<uint8_t> inside; // by statement
-};
-
-std::vector<LOOP_BODY> natural_loops(const FLOW& flow) {
+std::vector<LOOP_BODY> loops_of(const FLOW& flow) {
     std::vector<LOOP_BODY> loops;
     for (uint32_t head = 0; head < flow.before.size(); head++) {
         LOOP_BODY loop{head, {}, {}};
@@ -128,8 +129,14 @@ LOOP_COUNTS counts_of(const std::vector<STMT>& code, const LOOP_BODY& loop) {
 
 } // namespace
 
+std::vector<LOOP_BODY> natural_loops(const std::vector<STMT>& code, bool* is_reducible) {
+    const FLOW flow(code);
+    *is_reducible = flow.is_reducible();
+    return loops_of(flow);
+}
+
 std::vector<LOOP_COUNTS> count_innermost_loops(const std::vector<STMT>& code) {
-    const std::vector<LOOP_BODY> loops = natural_loops(FLOW(code));
+    const std::vector<LOOP_BODY> loops = loops_of(FLOW(code));
     std::vector<LOOP_COUNTS> counts;
     for (const LOOP_BODY& loop : loops) {
         const bool has_inner = std::any_of(loops.begin(), loops.end(), [&](const LOOP_BODY& other) {

@@ -101,7 +101,14 @@ struct TRIP_PROMISE {
     uint32_t head = 0; // index of a statement
     uint64_t min = 0, max = 0, multiple = 1;
     bool tested_first = false, tested_last = false; // by the keyword of the source, if it is known
+    bool is_record = false;                         // of a loop record: its tail is what is counted
     std::vector<uint8_t> roles;                     // of each statement in the loop
+};
+
+// What an I-file says of a loop by records: the numbers of kind 38, and the loop that a statement is in by kind 124.
+constexpr uint32_t NO_LOOP = UINT32_MAX;
+struct LOOP_RECORD {
+    uint32_t id, outer, min, max, multiple;
 };
 
 struct FUNCTION {
@@ -117,6 +124,8 @@ struct FUNCTION {
     bool variadic = false;
     std::vector<TRIP_PROMISE> promises; // of a checked run
     std::vector<HANDLING> handling;     // the exception table, the root first; empty without one
+    std::vector<LOOP_RECORD> loops;     // of one as well
+    std::vector<uint32_t> loop_of;      // the id of the innermost loop around each statement, or NO_LOOP
 };
 
 struct LIBRARY_ENTRY;

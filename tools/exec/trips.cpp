@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <map>
 
 namespace {
 constexpr uint64_t no_limit = ~uint64_t{0};
@@ -36,6 +37,7 @@ public:
     }
     bool find(TRIP_PROMISE& p) {
         if (p.head >= code_m.size()) return false;
+        if (p.is_record) return find_tail(p);
         std::vector<uint8_t> beside(code_m.size());
         spread(next_m, {0}, p.head, beside);
         TARGETS sources;
@@ -54,6 +56,14 @@ public:
 private:
     const std::vector<STMT>& code_m;
     std::vector<TARGETS> next_m, before_m;
+
+    // Of a record, whose roles tell what is in the loop: exits are told apart by the tail.
+    bool find_tail(TRIP_PROMISE& p) const {
+        for (uint32_t at = 0; at < code_m.size(); at++)
+            if (p.roles[at] && leaves_loop(p, at)) p.roles[at] = LEAVES_SOMEWHERE;
+        settle_exits_of_tail(p);
+        return true;
+    }
 
     bool leaves_loop(const TRIP_PROMISE& p, uint32_t at) const {
         return std::any_of(next_m[at].begin(), next_m[at].end(),
@@ -83,6 +93,74 @@ private:
             (at == p.head || p.tested_first))
             p.roles[at] = LEAVES_BEFORE;
     }
+    // What leaves the loop from the end of its tail has executed it, what leaves from elsewhere has not.
+    void settle_exits_of_tail(TRIP_PROMISE& p) const {
+        std::vector<uint8_t> exits(code_m.size());
+        for (uint32_t at = 0; at < code_m.size(); at++) {
+            if (!leaves(ROLE(p.roles[at]))) continue;
+            exits[at] = LEAVES_BEFORE;
+            if (is_bottom_test(p, at)) // one block, unless there is another entry to the branch back
+                exits[at] = goes_back(p, at) || before_m[at + 1].size() == 1 ? LEAVES_BEHIND : LEAVES_SOMEWHERE;
+        }
+        for (uint32_t at = 0; at < code_m.size(); at++)
+            if (exits[at]) p.roles[at] = exits[at];
+    }
+};
+
+// Which natural loop has which id, and whether the records say the same of nesting.
+class RECORD_BINDER {
+public:
+    explicit RECORD_BINDER(FUNCTION& function) : f(function) {
+        for (const LOOP_RECORD& r : f.loops) record_of[r.id] = &r;
+    }
+    std::string run() {
+        if (!f.handling.empty()) return ""; // handlers are entered where the code has no edge
+        bool is_reducible;
+        const std::vector<LOOP_BODY> loops = natural_loops(f.code, &is_reducible);
+        if (!is_reducible) return f.loops.size() == 1 ? "" : "loops are told of a function with cycles that are none";
+        if (f.loops.size() != loops.size() + 1)
+            return std::to_string(f.loops.size() - 1) + " loops are told of, and there are " + std::to_string(loops.size());
+        std::map<uint32_t, const LOOP_BODY*> seen;
+        for (const LOOP_BODY& loop : loops) {
+            const std::string fault = bind(loop, loops);
+            if (!fault.empty()) return fault;
+            if (!seen.insert({f.loop_of[loop.head], &loop}).second)
+                return "loop " + std::to_string(f.loop_of[loop.head]) + " is two";
+        }
+        return "";
+    }
+
+private:
+    std::string bind(const LOOP_BODY& loop, const std::vector<LOOP_BODY>& loops) {
+        const uint32_t id = f.loop_of[loop.head], outer = id_around(loop, loops);
+        const std::string name = "the loop of line " + std::to_string(f.code[loop.head].line);
+        const auto found = record_of.find(id);
+        if (found == record_of.end() || found->second->outer == id) return name + " has no record";
+        const LOOP_RECORD& r = *found->second;
+        if (outer == NO_LOOP ? !is_root(r.outer) : r.outer != outer)
+            return name + " is told to be in loop " + std::to_string(r.outer);
+        if (r.min > r.max || !r.multiple) return name + " has a record that contradicts itself";
+        TRIP_PROMISE t;
+        t.is_record = true;
+        t.head = loop.head;
+        if (!make_promise(r.min > 1 ? r.min : 0, r.max == UINT32_MAX ? 0 : r.max, r.multiple, t)) return "";
+        t.roles.assign(loop.inside.begin(), loop.inside.end());
+        f.promises.push_back(std::move(t));
+        return "";
+    }
+    uint32_t id_around(const LOOP_BODY& loop, const std::vector<LOOP_BODY>& loops) const {
+        const LOOP_BODY* around = nullptr;
+        for (const LOOP_BODY& other : loops)
+            if (&other != &loop && other.inside[loop.head] && (!around || around->inside[other.head])) around = &other;
+        return around ? f.loop_of[around->head] : NO_LOOP;
+    }
+    bool is_root(uint32_t id) const {
+        const auto found = record_of.find(id);
+        return found != record_of.end() && found->second->outer == id;
+    }
+
+    FUNCTION& f;
+    std::map<uint32_t, const LOOP_RECORD*> record_of;
 };
 
 uint64_t number(const std::vector<std::string>& words, size_t k) {
@@ -101,6 +179,12 @@ bool make_promise(uint64_t min, uint64_t max, uint64_t multiple, TRIP_PROMISE& p
 
 bool read_promise(const PRAGMA& pragma, TRIP_PROMISE& promise) {
     return make_promise(number(pragma.args, 0), number(pragma.args, 1), number(pragma.args, 2), promise);
+}
+
+std::string bind_loop_records(FUNCTION& f) {
+    if (f.loops.empty()) return "";
+    f.loop_of.resize(f.code.size(), f.loop_of.empty() ? NO_LOOP : f.loop_of.back());
+    return RECORD_BINDER(f).run();
 }
 
 void find_promised_loops(FUNCTION& f) {

@@ -43,6 +43,13 @@ protected:
         end();
     }
 
+    // The records of a function with one loop, and of where that begins.
+    void told(uint32_t min, uint32_t max, uint32_t multiple, uint32_t outer = 0) {
+        file->if_write_loop(0, 0, 1, 1, 1, 0);
+        file->if_write_loop(1, outer, min, max, multiple, 0);
+    }
+    void loop(uint32_t id, uint32_t at) { file->if_write_inloop(id, nullptr, 0), place(at); }
+
     std::vector<std::unique_ptr<PRAGMA>> pragmas;
 };
 
@@ -104,13 +111,13 @@ TEST_F(ControlTest, PromisesAreHeldOnlyOnRequest) {
 TEST_F(ControlTest, PromisesAreOfEachEntryAndActivation) {
     IC_SYMBOL* f = global("_nest", function_type({pkg.int_t}, pkg.void_t));
     file->if_write_begin_func(f, &psn);
+    told(3, 3, 1);
     IC_SYMBOL* n = parameter("n", pkg.int_t);
     file->if_write_end_args(&psn);
     IC_SYMBOL* i = local("i", pkg.int_t);
     body();
     statement(set(i, num(3, pkg.int_t)));
-    file->if_write_loop(1, 0, 3, 3, 0, 0);
-    place(1);
+    loop(1, 1);
     unless(name(n), 2);
     statement(call(f, node(MINUS, pkg.int_t, name(n), num(1, pkg.int_t))));
     place(2);
@@ -124,16 +131,43 @@ TEST_F(ControlTest, PromisesAreOfEachEntryAndActivation) {
     EXPECT_EQ(run(checked()).status, 0);
 }
 
-TEST_F(ControlTest, LoopRecordsPromise) {
+struct RECORD_ROW {
+    uint32_t min, max, multiple, outer, of; // `of`: the id that the loop's statements have
+    const char* fault;                      // null: the record is true of five iterations
+};
+void PrintTo(const RECORD_ROW& row, std::ostream* out) {
+    *out << row.min << " to " << row.max << " by " << row.multiple << " in " << row.outer << " of " << row.of;
+}
+class RecordTest : public ControlTest, public testing::WithParamInterface<RECORD_ROW> {};
+
+TEST_P(RecordTest, IsHeldAgainstTheRun) {
+    const RECORD_ROW& row = GetParam();
     begin(main_sym);
+    told(row.min, row.max, row.multiple, row.outer);
     IC_SYMBOL* i = local("i", pkg.uint_t);
     body();
     statement(set(i, num(4, pkg.uint_t)));
-    file->if_write_loop(1, 0, 1, UINT32_MAX, 2, 0);
-    place(1);
+    loop(row.of, 1);
     statement(node(NOTB, pkg.uint_t, name(i)));
     statement(node(ENDLOOP, pkg.uint_t, name(i), label(1)));
+    loop(0, 2);
     ret(0);
-    expect_error(EXEC_TRIPS, "iterated 5 times where at least 1 in multiples of 2", checked());
+    if (row.fault) return expect_error(EXEC_TRIPS, row.fault, checked());
+    end();
+    EXPECT_EQ(run(checked()).status, 0);
+}
+INSTANTIATE_TEST_SUITE_P(Loops, RecordTest,
+                         testing::Values(RECORD_ROW{5, 5, 5, 0, 1, nullptr}, RECORD_ROW{1, UINT32_MAX, 1, 0, 1, nullptr},
+                                         RECORD_ROW{1, UINT32_MAX, 2, 0, 1, "iterated 5 times where at least 0 in multiples of 2"},
+                                         RECORD_ROW{6, 9, 1, 0, 1, "at least 6"}, RECORD_ROW{0, 4, 1, 0, 1, "at most 4"},
+                                         RECORD_ROW{0, 9, 0, 0, 1, "contradicts itself"}, RECORD_ROW{1, 9, 1, 0, 0, "has no record"},
+                                         RECORD_ROW{1, 9, 1, 2, 1, "told to be in loop 2"}));
+
+TEST_F(ControlTest, RecordsAreOfAllLoops) {
+    begin(main_sym);
+    told(1, 1, 1);
+    body();
+    ret(0);
+    expect_error(EXEC_TRIPS, "1 loops are told of, and there are 0", checked());
 }
 } // namespace

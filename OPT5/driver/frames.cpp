@@ -41,6 +41,15 @@ void end() {
 
 } // namespace
 
+bool has_loops() {
+    if (has_hierarchy()) return true;
+    need(fact::block_numbers);
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const EDGE* e = bb->predecessors; e; e = e->rest)
+            if (e->first->dfn >= bb->dfn) return true;
+    return false;
+}
+
 void drop_hierarchy() {
     if (!has_hierarchy()) return;
     reinsert_loop_pragmas(currfuninfo->bb_list->loop);

@@ -16,5 +16,6 @@ extern const FRAME N;
 // The same; behind it the hierarchy goes and the blocks are simplified.
 extern const FRAME N_and_no_hierarchy;
 
+bool has_loops(); // of the current function: a hierarchy, or edges that lead back
 // Pragmas go back to the statements, and the blocks are simplified, since no hierarchy is needed any more.
 void drop_hierarchy();

@@ -46,6 +46,8 @@ register_option pass_enable_loop_fusion("enable:fusion");
 bool L2_with_branches() { return L2() && currfuninfo->bb_count >= 2; }
 bool L2_with_branches_on_28() { return L2_with_branches() && cpu_version == 28; }
 bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
+// What such a row does is for loops alone: a function without needs not be brought into the form of its frame.
+bool L2_with_loops() { return L2() && has_loops(); }
 bool is_stack_shared() { return L1() || (float_support | 1) != 11; }
 bool fusion_is_enabled() { return L2() && pass_enable_loop_fusion; }
 
@@ -237,7 +239,7 @@ const ROW steps[] = {
     /* 32 */ {L, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, none},
     /* 33 */ {L, "SSA_reg_promote", &N, L2, [] { promote_vars_to_registers(false); }, none, none},
     /* 34 */ {L, "loop_assertions", &D, L2, [] { with_hierarchy([] { find_loop_assertions(nullptr); }); }, none, none},
-    /* 35 */ {L, "sink_unused_definitions", &D, L2, [] { with_hierarchy(sink_definitions); }, none, none},
+    /* 35 */ {F, "sink_unused_definitions", &D, L2_with_loops, [] { with_hierarchy(sink_definitions); }, none, graph},
     /* 36 */ {L, "undeltafy", &D, L2, [] { undeltafy_dd_loops(root()); }, none, none},
     /* 37 */ {L, "add_downcounters", &D, L2, [] { with_hierarchy([] { add_downcounters_to_loops(root(), true, true); }); }, none, none},
     /* 38 */ {L, "collapse_loops", &D, L2, [] { with_hierarchy(collapse_loops); }, none, none},

@@ -8,12 +8,15 @@
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
 
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/scalar/implied_tests.h"
 #include "OPT5/simp/simp.h"
 
 namespace {
@@ -60,10 +63,38 @@ void keep_in_temporary(NODE** side, const struct LOOP* loop) {
     *side = mk_NAME(sym);
 }
 
+// Whether a test on top of a loop around decides the condition: in the body its control variable is ahead of its limit up
+// to the update at the end.
+bool is_implied_around(const NODE* condition, const struct LOOP* loop) {
+    bool holds = false;
+    for (const struct LOOP* outer = loop->parent; outer && !outer->is_root() && !holds; outer = outer->parent) {
+        if (outer->is_bottom_tested() || !outer->LCV || outer->LCV->has(IV_updated_in_head) || !outer->LCV->last) continue;
+        if (loop->head == outer->tail || loop->preheader == outer->head) continue;
+        NODE* known = maketree(outer->test, mk_NAME(outer->LCV->sym), copy_tree(outer->LCV->last), tp->int_t);
+        known = simp_tree(known, nullptr);
+        holds = pred_implies_pred(known, true, condition) == 1;
+        erase_tree(known);
+    }
+    return holds;
+}
+
+// Whether the first test is decided by what the loop starts with: the condition then, as a constant; null otherwise.
+NODE* decided_first_test(struct LOOP* loop) {
+    const LIST* s = loop->head->statements;
+    const NODE* condition = loop->head->branch()->left;
+    if (s->rest && tree_modifies_lvalue_in_tree(s->first, condition)) return nullptr;
+    NODE* value = find_expr_init(condition, loop);
+    if (!value || value->op == ICON) return value;
+    const bool holds = is_implied_around(value, loop);
+    erase_tree(value);
+    return holds ? mk_ICON(INT65(1), tp->int_t) : nullptr;
+}
+
 // The tail gets the head's first statement, if that has two, and a copy of its test in place of the branch.
 void copy_test_to_tail(struct LOOP* loop, BBLK* body, BBLK* exit) {
     BBLK *head = loop->head, *tail = loop->tail;
     NODE** side = staying_side(head->branch()->left, loop);
+    NODE* decided = decided_first_test(loop);
     debug_printf("\n\tReplicating WHILE loop test (loop #%d):\n\t%s\n\n", loop->uid, tree_to_infix(head->branch()->left).c_str());
     if (head->statements->rest) insert_at_end_of_body(tail, copy_tree(head->statements->first));
     keep_in_temporary(side, loop);
@@ -73,6 +104,11 @@ void copy_test_to_tail(struct LOOP* loop, BBLK* body, BBLK* exit) {
     change_successors(tail, {{head, body}});
     connect(tail, exit);
     edges_were_changed(currfuninfo);
+    if (decided) {
+        NODE* branch = head->branch();
+        erase_tree(branch->left);
+        branch->left = decided;
+    }
     debug_printf("\n\tNew WHILE loop:\n\n");
 }
 

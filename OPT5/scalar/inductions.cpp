@@ -7,9 +7,11 @@
 #include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/scalar/eda.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/implied_tests.h"
 #include "OPT5/simp/seq.h"
+#include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
 
 #include <algorithm>
@@ -180,7 +182,8 @@ void LOOP_FACTS::order_steps() {
     steps_end_iterations = true;
     for (const INDUCTION* i : in_order)
         for (const INDUCTION::STEP& s : i->steps) {
-            steps_end_iterations &= !s.bb->successors->rest && s.bb->successors->first == loop->header;
+            for (const EDGE* e = s.bb->successors; e; e = e->rest)
+                steps_end_iterations &= e->first == loop->header || !loops.contains(loop, e->first);
             int& first = first_step.emplace(s.bb, place.at(s.statement)).first->second;
             first = std::min(first, place.at(s.statement));
         }
@@ -392,6 +395,42 @@ int64_t constant_trip_count(const LOOP_TEST& test, int64_t* last_value) {
     if (stays(test.stay_op, value, limit) || in_type(value, i.sym->type) != value) return -1;
     *last_value = value;
     return trips;
+}
+
+// Whether the condition, which is consumed, holds where the loop is entered, by a test ahead of it that nothing behind it
+// takes back.
+bool LOOP_FACTS::is_entered_under(NODE* condition) const {
+    constexpr int MOST_BLOCKS = 4;
+    const READ_SET reads(condition);
+    bool holds = false;
+    const BBLK *to = loop->header, *bb = nullptr;
+    for (const EDGE* e = to->predecessors; e; e = e->rest)
+        if (!loops.contains(loop, e->first)) bb = bb ? to : e->first;
+    for (int n = 0; bb && bb != loop->header && n < MOST_BLOCKS && !holds; ++n) {
+        const NODE* control = bb->branch();
+        if (is_test(control)) {
+            const BBLK *yes = control->right->left->lbl->bblock, *no = control->right->right->lbl->bblock;
+            holds = yes != no && !tree_has_side_effects(control->left) && pred_implies_pred(control->left, yes == to, condition) == 1;
+        } else if (control->op != BRANCH)
+            break;
+        bool stays = !holds;
+        for (const LIST* s = bb->statements; s && stays; s = s->rest) stays = !reads.may_be_changed_by(s->first);
+        if (!stays || !bb->predecessors || bb->predecessors->rest) break;
+        to = bb;
+        bb = bb->predecessors->first;
+    }
+    erase_tree(condition);
+    return holds;
+}
+
+bool LOOP_FACTS::is_guarded(const LOOP_TEST& test) const {
+    if (!test.step_comes_first) return false;
+    const INDUCTION& i = *test.counter;
+    auto holds_for = [&](NODE* start) {
+        return is_entered_under(simp_tree(maketree(test.stay_op, start, copy_tree(test.limit), tp->int_t), nullptr));
+    };
+    if (holds_for(mk_NAME(i.sym))) return true;
+    return i.start_is_known && holds_for(mk_ICON(INT65(i.start), i.sym->type->stqs()));
 }
 
 // An unsigned counter does not wrap where each step follows a test that leaves room for it, or the first step follows a

@@ -52,6 +52,9 @@ public:
     INDUCTION* induction(const SYMTAB* sym);
     const std::vector<INDUCTION*>& all_inductions() const { return in_order; }
     const std::vector<LOOP_TEST>& tests() const { return exits; }
+    // Of a test behind its counter's step: whether one ahead of the loop lets it start only where the counter has not reached
+    // the limit, so that a step leads to the limit at the farthest.
+    bool is_guarded(const LOOP_TEST& test) const;
     double trip_count_estimate() const { return estimate; }
     int mentions(const SYMTAB* sym) const;       // NAMEs in the loop
     bool is_used_after(const SYMTAB* sym) const; // its value may be read where the loop is left
@@ -82,6 +85,7 @@ private:
     bool runs_once_in_each_iteration(const BBLK* bb) const;
     void judge_wrapping();
     void estimate_trip_count();
+    bool is_entered_under(NODE* condition) const;
     bool is_unchanged(const SYMTAB* sym, const NODE* name);
 
     const NATURAL_LOOPS& loops;

@@ -527,7 +527,8 @@ USE* MERGE::inner_pointer(GROUP& g) {
         if (loops.around(bb) != loop || !loops.dominates_latches(bb, loop) || !loops.dominates(bb, i->steps.front().bb))
             continue;
         if (bb->successors->rest || bb->successors->first != it->second.loop->header) continue;
-        if (test && (test == bb || !loops.dominates(test, bb))) continue;
+        // The test sees the pointer where this loop's iteration starts, or behind the step, where the next one does.
+        if (test && !mapped->step_comes_first && (test == bb || !loops.dominates(test, bb))) continue;
         if (std::all_of(g.uses.begin(), g.uses.end(), [&](const USE& other) {
                 return &other == &use || (other.bb == bb && follows(bb, other.statement, use.statement));
             }))
@@ -609,6 +610,7 @@ NODE* MERGE::last_address(const LOOP_TEST& test, const GROUP& g) {
         const INT65 bound(first - (includes_limit ? by : 0));
         if (by > 0 ? bound <= nearest : nearest <= bound) return address;
     }
+    if (facts.is_guarded(test)) return address;
     NODE* value = i.start_is_known ? mk_ICON(INT65(first), type) : mk_NAME(i.sym);
     NODE* runs = maketree(test.stay_op, value, copy_tree(test.limit), tp->int_t);
     NODE* at_first = mk_NAME(g.sym);

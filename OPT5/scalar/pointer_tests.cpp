@@ -125,7 +125,7 @@ private:
 
     // The limit may lie behind the counter from the start: then the first test leaves.
     NODE* end_or_first(NODE* end) const {
-        if (test->stay_op == NEQ) return end;
+        if (test->stay_op == NEQ || facts.is_guarded(*test)) return end;
         TYPE* type = counter->sym->type->stqs();
         const int64_t ahead_of_test = test->step_comes_first ? step() : 0;
         NODE* value = counter->start_is_known ? mk_ICON(INT65(counter->start + ahead_of_test), type) : mk_NAME(counter->sym);

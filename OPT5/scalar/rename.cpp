@@ -11,7 +11,7 @@
 // it. Only an assignment that is a statement starts a new value; one under a condition, one in front of an exception's
 // dispatch, a step or a part of the variable belongs to the web of the value before it, since that value may still be
 // seen behind it.
-#include "OPT5/scalar/merge.h"
+#include "OPT5/scalar/rename.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"

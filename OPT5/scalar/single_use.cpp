@@ -6,7 +6,7 @@
 // that their NAMEs alone reach, none of which is assigned in between. A value that is loaded moves into the next
 // statement alone, and only if that does nothing before it reads it: in `t = *p; *q = 1; x = t` the store may meet the
 // load. The read may stand under a condition: then less is computed.
-#include "OPT5/scalar/merge.h"
+#include "OPT5/scalar/rename.h"
 
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"

@@ -10,7 +10,7 @@
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
 #include "OPT5/scalar/implied_tests.h"
-#include "OPT5/scalar/inductions.h"
+#include "OPT5/dd/inductions.h"
 #include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/scalar/merge.h"

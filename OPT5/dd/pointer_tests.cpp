@@ -17,7 +17,7 @@
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/scalar/inductions.h"
+#include "OPT5/dd/inductions.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/simp/simp.h"
 

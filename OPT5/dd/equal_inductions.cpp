@@ -11,7 +11,7 @@
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/scalar/inductions.h"
+#include "OPT5/dd/inductions.h"
 
 #include <utility>
 

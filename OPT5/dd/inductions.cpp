@@ -1,7 +1,8 @@
-#include "OPT5/scalar/inductions.h"
+#include "OPT5/dd/inductions.h"
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/effects.h"
+#include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
@@ -56,26 +57,9 @@ bool as_step(const TYPE* type, int op, const NODE* added, INDUCTION::STEP* step)
 }
 
 bool is_step(const NODE* t, INDUCTION::STEP* step) {
-    const NODE* name = t->left;
-    if (!name || name->op != NAME || !t->right || !may_count(name->u.sym)) return false;
-    const TYPE* type = name->u.sym->type;
-    switch (t->op) {
-    case PLUSPLUS:
-    case PLUSASG: return as_step(type, PLUS, t->right, step);
-    case MINMIN:
-    case MINUSASG: return as_step(type, MINUS, t->right, step);
-    case ASG: {
-        const NODE* sum = t->right;
-        if (sum->op != PLUS && sum->op != MINUS) return false;
-        if (type->is_int() && (sum->type->size != type->size || sum->type->is_unsigned() != type->is_unsigned()))
-            return false;
-        const bool is_left = sum->left->op == NAME && sum->left->u.sym == name->u.sym;
-        if (is_left) return as_step(type, sum->op, sum->right, step);
-        return sum->op == PLUS && sum->right->op == NAME && sum->right->u.sym == name->u.sym &&
-               as_step(type, PLUS, sum->left, step);
-    }
-    default: return false;
-    }
+    INDUCTION_UPDATE u;
+    if (!is_induction_update(t, &u) || u.is_narrowed || !may_count(u.sym)) return false;
+    return as_step(u.sym->type, u.is_subtracted ? MINUS : PLUS, u.amount, step);
 }
 
 bool is_understood(const NODE* t) {

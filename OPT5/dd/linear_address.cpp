@@ -1,4 +1,4 @@
-#include "OPT5/scalar/linear_address.h"
+#include "OPT5/dd/linear_address.h"
 
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"

@@ -1,7 +1,7 @@
 // Induction variables of a natural loop, its exit tests, and its trip count.
 #pragma once
 
-#include "OPT5/scalar/linear_address.h"
+#include "OPT5/dd/linear_address.h"
 
 #include <cstdint>
 #include <unordered_map>

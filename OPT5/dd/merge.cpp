@@ -13,7 +13,9 @@
 // loop, as in `i += k++`, is no induction's. What is computed ahead of the loop is arithmetic on variables and
 // addresses, which cannot fail; no load moves. A test that a pointer takes over becomes one for inequality, which holds
 // in arithmetic that wraps: with a step of one, or a known trip count, the pointer meets its last value exactly.
-#include "OPT5/scalar/merge.h"
+#include "OPT5/dd/merge.h"
+
+#include "OPT5/scalar/rename.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
@@ -25,7 +27,7 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/scalar/eda.h"
-#include "OPT5/scalar/inductions.h"
+#include "OPT5/dd/inductions.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/ir/loops.h"
 #include "OPT5/simp/exact.h"

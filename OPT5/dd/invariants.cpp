@@ -17,8 +17,8 @@
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/scalar/inductions.h"
-#include "OPT5/scalar/merge.h"
+#include "OPT5/dd/inductions.h"
+#include "OPT5/dd/merge.h"
 #include "OPT5/simp/exact.h"
 
 #include <algorithm>

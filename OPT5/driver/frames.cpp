@@ -29,11 +29,7 @@ void begin(bool force) {
     do_dd_for_be = false;
     widen_user_variables();
     split_qualified_parameter_copies();
-<<<<<<< HEAD
     normalize_all_trees();
-=======
-    normalize_statements();
->>>>>>> cb1292e (The search for inductions and the merging of symbols stand with the loops; one place says what an update is)
     if (pass_debug_hierarchy && (force || !has_hierarchy())) build_loop_hierarchy(force, false, force, 1);
 }
 

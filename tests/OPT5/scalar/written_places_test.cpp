@@ -13,7 +13,8 @@
 #include "OPT5/dd/inductions.h"
 #include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lcse.h"
-#include "OPT5/scalar/merge.h"
+#include "OPT5/dd/merge.h"
+#include "OPT5/scalar/rename.h"
 #include "OPT5/scalar/simpcfg.h"
 
 #include <cstring>

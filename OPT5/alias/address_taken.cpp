@@ -49,9 +49,11 @@ bool is_object_itself(const NODE* t) {
     return trees_are_normalized ? object->size == t->type->size : compatible_types(object, t->type, true);
 }
 
-// `is_access_address`: `t` is the pointer of an access, from which the object can be told.
-void mark_addressed(const NODE* t, bool is_access_address) {
+// `is_access_address`: `t` is the pointer of an access, from which the object can be told. Adds the nodes that write to
+// their left operand to `writes`.
+void mark_addressed(const NODE* t, bool is_access_address, int& writes) {
     while (t) {
+        writes += writes_left_operand(t->op);
         const NODE* next = t->left;
         bool keeps = false;
         switch (t->op) {
@@ -60,11 +62,11 @@ void mark_addressed(const NODE* t, bool is_access_address) {
             return;
         case ARASG: // assigns arrays as values
             for (const NODE* side : {t->left, t->right})
-                if (side->op != NAME) mark_addressed(side, false);
+                if (side->op != NAME) mark_addressed(side, false, writes);
             return;
         case UMULT:
             if (is_object_itself(t)) return;
-            mark_addressed(t->right, false);
+            mark_addressed(t->right, false, writes);
             is_access_address = t->left->type->is_pointer();
             t = next;
             continue;
@@ -100,14 +102,14 @@ void mark_addressed(const NODE* t, bool is_access_address) {
         case PLUS:
         case MINUS:
             keeps = is_access_address && t->type->is_pointer();
-            mark_addressed(t->right, keeps && t->op == PLUS && !t->left->type->is_pointer());
+            mark_addressed(t->right, keeps && t->op == PLUS && !t->left->type->is_pointer(), writes);
             break;
         case PCONV:
         case ISP2CHAR:
         case IDENTITY:
         case OUIALIGN:
         case NONALIGN: keeps = is_access_address && t->type->is_pointer(); break;
-        default: mark_addressed(t->right, false);
+        default: mark_addressed(t->right, false, writes);
         }
         is_access_address = keeps && next && next->type->is_pointer();
         t = next;
@@ -147,12 +149,17 @@ void set_marks(POINTER_WRITES* writes) {
     for_each_symbol([](SYMTAB* s) { s->set_is_aliased(false); });
     for (SYMTAB* s : f->dropped_syms) s->set_is_aliased(false);
     unmark_globals();
-    for_each_tree(f, [writes](const NODE* tree) {
-        mark_addressed(tree, false);
-        for_each_subtree(tree, [writes](const NODE* t) {
-            if (SYMTAB* sym = written_in_part(t)) mark(sym);
-            if (writes) writes->collect(t);
-        });
+    auto look_at_write = [writes](const NODE* t) {
+        if (SYMTAB* sym = written_in_part(t)) mark(sym);
+        if (writes) writes->collect(t);
+    };
+    for_each_tree(f, [&](const NODE* tree) {
+        int count = 0;
+        mark_addressed(tree, false, count);
+        if (count > writes_left_operand(tree->op))
+            for_each_subtree(tree, look_at_write);
+        else if (count)
+            look_at_write(tree);
     });
 }
 

@@ -120,13 +120,20 @@ template <class F> void for_each_branch_target(NODE* tree, F&& visit) {
         return;
     }
     if (tree->op != IF && tree->op != SWITCH && tree->op != CBRANCH) return;
-    // A case list leans left: the last element is on the right of the outermost COMMA.
-    std::vector<NODE*> elements;
+    auto look_at = [&](NODE* element) {
+        NODE* e = element->op == CASE ? element->right : element->op == DEFAULT ? element->left : element;
+        if (e && e->op == LABELREF) visit(e);
+    };
+    // A case list leans left: the last element is on the right of the outermost COMMA. Most have two.
     NODE* t = tree->right;
+    if (t && t->op == COMMA && t->left && t->left->op != COMMA) {
+        NODE* last = t->right;
+        look_at(t->left);
+        look_at(last);
+        return;
+    }
+    std::vector<NODE*> elements;
     for (; t && t->op == COMMA; t = t->left) elements.push_back(t->right);
     if (t) elements.push_back(t);
-    for (auto it = elements.rbegin(); it != elements.rend(); ++it) {
-        NODE* e = (*it)->op == CASE ? (*it)->right : (*it)->op == DEFAULT ? (*it)->left : *it;
-        if (e && e->op == LABELREF) visit(e);
-    }
+    for (auto it = elements.rbegin(); it != elements.rend(); ++it) look_at(*it);
 }

@@ -59,10 +59,10 @@ private:
         const NODE* value = nullptr; // null: it is no plain one
     };
 
-    // What the block ahead gives a variable last.
-    ASSIGNMENT last_assignment(const SYMTAB* sym) const {
+    // What the block gives a variable last.
+    static ASSIGNMENT last_assignment(const SYMTAB* sym, const BBLK* bb) {
         ASSIGNMENT last;
-        for (const LIST* l = ahead->statements; l; l = l->rest)
+        for (const LIST* l = bb->statements; l; l = l->rest)
             for_each_written_name(l->first, [&](const NODE* name, const NODE*) {
                 if (name->u.sym != sym) return;
                 const NODE* t = l->first;
@@ -73,8 +73,14 @@ private:
         return last;
     }
 
+    // Both are set in one block, ahead of which control comes from nowhere else.
     bool start_alike(const SYMTAB* a, const SYMTAB* b) const {
-        ASSIGNMENT first = last_assignment(a), second = last_assignment(b);
+        constexpr int MOST_BLOCKS = 4;
+        const BBLK* bb = ahead;
+        for (int n = 0; bb && n < MOST_BLOCKS && !last_assignment(a, bb).cell && !last_assignment(b, bb).cell; ++n)
+            bb = bb->predecessors && !bb->predecessors->rest ? bb->predecessors->first : nullptr;
+        if (!bb) return false;
+        ASSIGNMENT first = last_assignment(a, bb), second = last_assignment(b, bb);
         if (!first.value || !second.value) return false;
         for (const LIST* l = second.cell; l && first.cell != l; l = l->rest)
             if (l->rest == first.cell) {

@@ -167,7 +167,7 @@ bool DISCOVERY::find_natural_loops() {
         if (natural.around(bb) && tree_is_EH_SWITCH(bb->branch())) return false;
     SIDE_TABLE<struct LOOP*> of_head(nullptr);
     for (const auto& found : natural.inner_first()) {
-        hierarchy.loops.push_back(make_LOOP(found->header, found->latches.front(), static_cast<int>(hierarchy.loops.size()), nullptr));
+        hierarchy.loops.push_back(make_LOOP(found->header, found->latches.front(), static_cast<int>(hierarchy.loops.size()) + 1, nullptr));
         of_head[found->header] = hierarchy.loops.back().get();
     }
     for (const auto& found : natural.inner_first()) {

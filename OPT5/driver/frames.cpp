@@ -17,8 +17,6 @@
 
 namespace {
 
-// Until what is known of loops reaches the output again, the hierarchy is built on request.
-register_option pass_debug_hierarchy("debug:hierarchy");
 
 bool has_hierarchy() { return currfuninfo->bb_list && currfuninfo->bb_list->loop; }
 
@@ -30,7 +28,7 @@ void begin(bool force) {
     widen_user_variables();
     split_qualified_parameter_copies();
     normalize_all_trees();
-    if (pass_debug_hierarchy && (force || !has_hierarchy())) build_loop_hierarchy(force, false, force, 1);
+    if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, 1);
 }
 
 void end() {

@@ -202,9 +202,10 @@ private:
 
     bool simplify_branch(BBLK* bb) {
         if (bb->is_in_LIR_form()) return false;
+        const bool was_loop = control_of(bb)->first->op == IF && edge_memberp(bb, bb->successors);
         bool changed = thread(bb);
         LIST* control = control_of(bb);
-        if (control->first->op == IF && edge_memberp(bb, bb->successors)) drop_promises_of(bb);
+        if (!was_loop && control->first->op == IF && edge_memberp(bb, bb->successors)) drop_promises_of(bb);
         if (BBLK* target = decided_target(control->first)) {
             const std::vector<BBLK*> old = successors_of(bb);
             make_branch(bb, control, target);

@@ -11,6 +11,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/simp/simp.h"
@@ -68,6 +69,7 @@ private:
         LBL* lbl = label_cell->first->lbl;
         NODE* targets = label_cell->rest->first->right;
         if (targets->left->lbl != lbl || lbl->refcount != 1 || lbl->index >= 0) return false;
+        drop_promises_of_test_loop(label_cell->rest->rest, t->left);
         erase_tree(targets->left);
         targets->left = t->left;
         erase_node(t);
@@ -76,6 +78,23 @@ private:
         delete label_cell;
         delete lbl;
         return true;
+    }
+
+    // A loop that was written with its test on top, and jumps back right behind it, has no body: it evaluates its test once
+    // more than it has iterations, and a reader would take that for the number that was promised.
+    static void drop_promises_of_test_loop(LIST* back, const NODE* target) {
+        while (back && back->first->op != LABELDEF && !op_transfers_control(back->first->op)) back = back->rest;
+        if (!back || back->first->op != LABELDEF || back->first->lbl->index != target->u.lval.fits_in<int32_t>()) return;
+        auto is_pragma = [](const LIST* c) { return c && c->first->op == PPRAGMA; };
+        for (const LIST* c = back->rest; is_pragma(c); c = c->rest) {
+            const PRAGMA* p = c->first->pragma;
+            if (p->kind == PRG_SRC_LOOP && p->args.size() > 3 && p->args[3] == "do") return;
+        }
+        for (LIST** link = &back->rest; is_pragma(*link);)
+            if ((*link)->first->pragma->kind == PRG_MUST_ITERATE || (*link)->first->pragma->kind == PRG_PROB_ITERATE)
+                drop_statement(link);
+            else
+                link = &(*link)->rest;
     }
 
     void emit(NODE* t) {

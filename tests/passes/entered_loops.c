@@ -38,7 +38,7 @@ int in_object(void) {
 }
 
 // FUNCTION: not_in_object
-// COUNT 2: /from \+ 8/
+// HAS: /^if \(!\(p <u/
 int not_in_object(const int *from) {
     int s = 0;
     for (const int *p = from + 3; p < from + 8; p++) s = s * 3 + *p;
@@ -90,8 +90,8 @@ int changed_condition(const int *p, int n) {
 
 // An earlier test decides the first one of an inner loop, as long as nothing changes what it asks.
 // FUNCTION: triangle
-// COUNT 1: i < n
 // COUNT 0: j < n
+// COUNT 1: n > 0
 int triangle(int n) {
     int s = 0;
     for (int i = 0; i < n; i++)
@@ -100,7 +100,7 @@ int triangle(int n) {
 }
 
 // FUNCTION: moved
-// COUNT 1: j < n
+// COUNT 2: i < n
 int moved(int n) {
     int s = 0;
     for (int i = 0; i < n; i++) {
@@ -121,7 +121,7 @@ void unknown(void) {
 }
 
 // FUNCTION: stepped
-// COUNT 1: s >= 4
+// COUNT 0: goto
 int stepped(int s) {
     s = 4;
     g[s++]++;
@@ -134,7 +134,7 @@ int stepped(int s) {
 // HAS: /MUST_ITERATE/
 // HAS: /^L\d+:/
 // HAS: /w == 3/
-// COUNT 1: MUST_ITERATE
+// COUNT 2: MUST_ITERATE
 long promised(int k, int *p) {
     int w, j;
     long s = 0;

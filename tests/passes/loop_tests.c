@@ -7,12 +7,13 @@ int g[8];
 
 // FUNCTION: nested
 // COUNT 0: ?
-// COUNT 1: if (!(i > 0)) goto L3
-// HAS: /^if .* goto L4/
-// HAS: /^if .* goto L3/
+// COUNT 1: if (!(i > 0)) goto L5
+// HAS: /^if .* goto L6/
 // HAS: L2:
+// HAS: /^if .* goto L5/
+// HAS: L4:
+// HAS: /^if .* goto L4/
 // HAS: /^if .* goto L2/
-// HAS: /^if .* goto L1/
 // COUNT 0: /^goto/
 int nested(int n) {
     int sum = 0, i, j;

@@ -10,7 +10,7 @@ long m[8][8], w[64];
 // HAS: s += *$O$P0 * *$O$P1
 // HAS: $O$P0 += 1
 // NOT: i
-// HAS: if (!($O$P0 == $O$P2)) goto L1
+// HAS: if (!($O$P0 == $O$P2)) goto L2
 // COUNT 0: n > 0 ? x + n : x
 int dot(const int *x, const int *y, int n) {
     int s = 0;
@@ -195,7 +195,7 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
 // A pointer of an inner loop with a known trip count continues from where that loop left it; not where it may be left early,
 // where the outer counter steps ahead of it, or where the count is not known.
 // FUNCTION: nests
-// COUNT 6: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
+// COUNT 4: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
 long nests(int n, int k) {
     long s = 0;
     for (int i = 0; i < 8; i++)
@@ -254,7 +254,7 @@ int apart(const int *x, int n) {
 // A pointer that steps beside a counter takes its test: up, down and over a limit, with the pointer's step on either side of
 // the test and the loop perhaps not entered.
 // FUNCTION: beside
-// COUNT 0: n -=
+// COUNT 1: n -=
 // COUNT 0: i +=
 // COUNT 0: m -=
 // COUNT 0: k -=
@@ -272,7 +272,7 @@ long beside(const int *p, const long *q, int n, unsigned u) {
 
 // Not where the counter is needed, may wrap, or passes its limit by more than one; nor where a step is left out.
 // FUNCTION: not_beside
-// COUNT 1: /^n -= 1/
+// COUNT 2: /^n -= 1/
 // COUNT 2: /^u [-+]= [13]/
 // COUNT 1: /^k [+]= 1/
 long not_beside(const int *p, int n, unsigned u, int k) {
@@ -292,7 +292,7 @@ long not_beside(const int *p, int n, unsigned u, int k) {
 // HAS: /^[$]O[$]P\d+ = &_b$/
 // HAS: $O$N1 = (int)((unsigned int)k * 3) ^ n
 // HAS: $O$N2 = (int)((unsigned int)_g + 2)
-// HAS: L1:
+// HAS: L2:
 // COUNT 1: &_b
 int g = 5;
 int invariant(int n, int k) {

@@ -21,11 +21,11 @@ long two_loops(int n) {
 }
 
 // FUNCTION: nested
-// HAS: /MUST_ITERATE\("", "2"/
+// HAS: /MUST_ITERATE\("2", "2", "2"/
 // NOT: /j \+= 1/
 // HAS: /k \+= 1/
-// HAS: /MUST_ITERATE\("", "4"/
-// HAS: /j < n.* goto/
+// HAS: /n > 0.* goto/
+// HAS: /MUST_ITERATE\("1", "4", "1"/
 // NOT: /k \+= 1/
 // HAS: /j \+= 1/
 long nested(int n) {
@@ -58,7 +58,7 @@ void only_a_test(void) {
 
 // What was promised of a loop that is no more is not promised of the next one, nor of what leads there.
 // FUNCTION: left_at_once
-// COUNT 0: MUST_ITERATE
+// COUNT 0: MUST_ITERATE("1", "1"
 // COUNT 1: if (!(c))
 long left_at_once(int n, int c) {
     long s = 0;
@@ -75,7 +75,7 @@ long left_at_once(int n, int c) {
 }
 
 // FUNCTION: never_run
-// COUNT 0: MUST_ITERATE
+// COUNT 0: /MUST_ITERATE\("[^"]*", "1"/
 long never_run(int n) {
     long s = 0;
     int i = 7;

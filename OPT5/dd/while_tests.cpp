@@ -112,7 +112,16 @@ void copy_test_to_tail(struct LOOP* loop, BBLK* body, BBLK* exit) {
     debug_printf("\n\tNew WHILE loop:\n\n");
 }
 
+// A variable that is tested for truth is compared with 0.
+void compare_variable(NODE* test) {
+    NODE* variable = test->left;
+    if (variable->op != NAME || !variable->type->is_int()) return;
+    TYPE* type = variable->type->stqs();
+    test->left = maketree(NEQ, variable, mk_ICON(INT65(0), type), tp->int_t);
+}
+
 bool replicate(struct LOOP* loop) {
+    if (has_shape(loop)) compare_variable(loop->head->branch());
     if (!has_shape(loop) || !staying_side(loop->head->branch()->left, loop)) return false;
     const NODE* targets = loop->head->branch()->right;
     BBLK *yes = targets->left->lbl->bblock, *no = targets->right->lbl->bblock;

@@ -132,6 +132,28 @@ NODE* normal_assertion(NODE* t) {
     return without_shift(mask_as_remainder(t));
 }
 
+// (unsigned)x - 7u < 3u as x >= 7 and x <= 9: null where it is nothing of that kind. The tree is consumed then.
+bool split_range(NODE* t, std::vector<NODE*>& parts) {
+    if ((t->op != ULT && t->op != ULE) || t->right->op != ICON) return false;
+    NODE *sum = t->left, *cast = sum;
+    TYPE* type = sum->type->stqs();
+    INT65 low(0);
+    if ((sum->op == PLUS || sum->op == MINUS) && sum->right->op == ICON && type->is_int()) {
+        const INT65 k = sign_extend_by_type_size(sum->right->u.lval, type);
+        low = sum->op == PLUS ? -k : k;
+        cast = sum->left;
+    }
+    if (cast->op != SCONV || !type->is_int() || !type->is_unsigned() || cast->type->size != type->size) return false;
+    TYPE* own = cast->left->type->stqs();
+    if (!own->is_int() || !own->is_signed() || own->size != type->size) return false;
+    const INT65 high = low + truncate_to_type(t->right->u.lval, type) - INT65(t->op == ULT ? 1 : 0);
+    if (low < int_type_min(own) || high > int_type_max(own) || high < low) return false;
+    parts.push_back(maketree(GE, copy_tree(cast->left), mk_ICON(low, own), tp->int_t));
+    parts.push_back(maketree(LE, copy_tree(cast->left), mk_ICON(high, own), tp->int_t));
+    erase_tree(t);
+    return true;
+}
+
 // The conjuncts, in order. The tree is consumed.
 void split(NODE* t, std::vector<NODE*>& parts) {
     std::vector<NODE*> work{t};
@@ -144,7 +166,7 @@ void split(NODE* t, std::vector<NODE*>& parts) {
         };
         if (t->op == NEQ && is_icon(t->right, INT65(0)) && joins(t->left)) t = replaced_by(t, t->left);
         if (!joins(t)) {
-            parts.push_back(t);
+            if (!split_range(t, parts)) parts.push_back(t);
             continue;
         }
         work.push_back(t->right);

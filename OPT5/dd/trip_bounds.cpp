@@ -213,6 +213,7 @@ private:
         case UGT: r.min = std::max(r.min, c + 1); break;
         case GE:
         case UGE: r.min = std::max(r.min, c); break;
+        case NEQ: r = {r.min + (r.min == c), r.max - (r.max == c)}; break;
         default: return;
         }
         if (r.min <= r.max) range = r; // otherwise they contradict each other
@@ -367,7 +368,8 @@ void refine_by_facts(const NODE* trips, struct LOOP* loop, KNOWN_TRIPS* known) {
     if (!read_form(trips, loop, &form, &term)) return;
     divide_by_gcd(&form, form.term);
     TERM_FACTS facts(form, term);
-    for_each_given(loop, [&](const NODE* condition, bool holds) { facts.take(condition, holds); });
+    for (int n = 0; n < 2; ++n) // what is not equal counts at an end that another fact gives
+        for_each_given(loop, [&](const NODE* condition, bool holds) { facts.take(condition, holds); });
     DOMINATOR_WALK(form.term, &facts).from(loop->preheader);
     const BOUNDS& n = facts.bounds();
     const WIDE_INT a = form.at(n.min), b = form.at(n.max);

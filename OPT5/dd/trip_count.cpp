@@ -186,12 +186,33 @@ std::optional<WIDE_INT> constant_difference(const NODE* a, const NODE* b, unsign
     return form.constant;
 }
 
+// With what the loop's invariants were given ahead of it, in place of their names.
+NODE* with_values_of_invariants(NODE* t, const struct LOOP* loop) {
+    for (const struct LOOP* l = loop; l && !l->is_root(); l = l->parent)
+        for (const auto& iv : l->IVs) {
+            if (!iv->has(IV_is_RC) || !iv->init || iv->init->type->size != iv->sym->type->size || !sym_appears_in_tree(iv->sym, t)) continue;
+            if (l != loop && !expr_is_constant(iv->init) && !tree_is_RC_in_loop(iv->init, l, false)) continue;
+            OWNED_TREE name(mk_NAME(iv->sym)), value(denormalized_copy(iv->init));
+            if (!iv->sym->type->is_pointer() && iv->init->type->is_int()) value.reset(coerce_to_type(iv->sym->type->stqs(), value.release()));
+            if (sym_appears_in_tree(iv->sym, value.get())) continue;
+            t = subst_tree_for_lvalue_in_tree(value.get(), name.get(), t);
+        }
+    return t;
+}
+
+std::optional<WIDE_INT> difference_of_ends(const COUNTER& c, unsigned bits, bool wraps) {
+    if (auto d = constant_difference(c.limit.get(), c.init.get(), bits, wraps)) return d;
+    const OWNED_TREE limit(with_values_of_invariants(copy_tree(c.limit.get()), c.loop));
+    const OWNED_TREE init(with_values_of_invariants(copy_tree(c.init.get()), c.loop));
+    return constant_difference(limit.get(), init.get(), bits, wraps);
+}
+
 // limit - init where that is one number: of the values, not modulo their width.
 std::optional<WIDE_INT> known_distance(const COUNTER& c, bool passes_on_entry) {
     if (c.is_pointer || !c.is_unsigned())
-        if (auto d = constant_difference(c.limit.get(), c.init.get(), 64, false)) return d;
+        if (auto d = difference_of_ends(c, 64, false)) return d;
     if (!passes_on_entry || (!goes_up(c.op) && !goes_down(c.op))) return std::nullopt;
-    auto d = constant_difference(c.limit.get(), c.init.get(), static_cast<unsigned>(c.type->size), true);
+    auto d = difference_of_ends(c, static_cast<unsigned>(c.type->size), true);
     if (!d || c.type->size > 64) return std::nullopt;
     // The test says on which side the limit lies.
     const WIDE_INT turn = static_cast<WIDE_INT>(1) << c.type->size;
@@ -338,7 +359,7 @@ COUNT count_of(const COUNTER& c) {
         return n ? COUNT{count_icon(*n), false} : COUNT{};
     }
     if (c.is_unsigned() && c.op == NEQ && c.type->size <= 64)
-        if (const auto d = constant_difference(c.limit.get(), c.init.get(), static_cast<unsigned>(c.type->size), true)) {
+        if (const auto d = difference_of_ends(c, static_cast<unsigned>(c.type->size), true)) {
             const auto n = modular_steps(*d, c.step, static_cast<unsigned>(c.type->size), c.first_test());
             return n ? COUNT{count_icon(*n), true} : COUNT{};
         }

@@ -298,7 +298,6 @@ void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoo
     install_callbacks();
     unbuild_loop_hierarchy();
     if (!find_tree(requireLoops < 0 ? full : requireLoops != 0)) return;
-    currfuninfo->loops_are_shaped = true;
     for (;;) {
         if (scalars) propagate_PT_info();
         find_symbols_and_variables(loop_root());

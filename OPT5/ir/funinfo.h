@@ -157,7 +157,6 @@ public:
     int32_t label_counters[2] = {0, 0}; // internal labels, counting down; chosen by `internal_label_index`
     int lva_sym_count = 0;
     void* hierarchy = nullptr;
-    bool loops_are_shaped = false; // a hierarchy has stood: a promise counts the executions of its loop's last block
     std::vector<NODE*> givens; // facts that hold in the whole function
     std::vector<std::string> comments;  // comment lines ahead of the function in the output
     std::vector<std::string> info_text; // buffered info text of the worker mode

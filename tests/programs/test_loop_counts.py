@@ -122,7 +122,7 @@ class LoopCounts(unittest.TestCase):
             source, unit, out = (Path(folder) / name for name in ("p.c", "p.if", "p.opt"))
             source.write_text(program(rows))
             tools.parse(source, unit)
-            tools.optimize(unit, out, [*words, "--debug:hierarchy", "--debug:validate", "--disable_inlining"])
+            tools.optimize(unit, out, [*words, "--debug:validate", "--disable_inlining"])
             return tools.execute(unit), tools.execute(out, ["--check"]), tools.dump(out)
 
     def test_counts_are_proved(self):

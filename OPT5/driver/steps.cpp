@@ -273,7 +273,7 @@ const ROW steps[] = {
     /* 65 */ {L, "late points-to", nullptr, L2_with_branches, propagate_PT_info, none, none},
     /* 66 */ {L, "global CSE", nullptr, L2_with_branches, global_CSE, none, none},
     /* 67 */ {L, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, none, none},
-    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, rename_symbols, dominators | live_variables, graph},
+    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph},
     /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph},
     /* 70 */ {L, "DD restructuring", nullptr, always, nothing, none, none},
     /* 71 */ {L, "expand cluster refs", nullptr, always, expand_cluster_refs, none, none},

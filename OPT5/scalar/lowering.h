@@ -21,6 +21,9 @@ void explode_auto_struct_vars();
 // Divisions by constants become multiplications where the target gains.
 void transform_DIVs_by_ICONs();
 
+// Masks that clear no bit of what variables hold go.
+void drop_needless_masks();
+
 // Assignments of a static-initializer function become initial values.
 void convert_sti_to_cinit();
 

@@ -60,6 +60,12 @@ uint64_t trailing_zeros_mask(uint64_t zeros) {
     return ~zeros & (zeros + 1) ? (zeros ^ (zeros + 1)) >> 1 : ~uint64_t(0);
 }
 
+// Zeros above the highest bit of the greatest value.
+KNOWN_BITS at_most(uint64_t value, uint64_t mask) {
+    for (int s = 1; s < 64; s *= 2) value |= value >> s;
+    return {mask & ~value, 0};
+}
+
 KNOWN_BITS multiply(KNOWN_BITS a, KNOWN_BITS b, uint64_t mask) {
     // As many trailing zeros as both have together.
     int n = 0;
@@ -67,6 +73,8 @@ KNOWN_BITS multiply(KNOWN_BITS a, KNOWN_BITS b, uint64_t mask) {
     for (uint64_t z = trailing_zeros_mask(b.zeros); z & 1; z >>= 1) ++n;
     KNOWN_BITS k;
     k.zeros = n >= 64 ? mask : ((uint64_t(1) << n) - 1) & mask;
+    const unsigned __int128 most = static_cast<unsigned __int128>(~a.zeros & mask) * (~b.zeros & mask);
+    if (most <= mask) k.zeros |= at_most(static_cast<uint64_t>(most), mask).zeros;
     return k;
 }
 
@@ -95,15 +103,10 @@ KNOWN_BITS divide(const NODE* t, int levels) {
     const TYPE* type = t->type;
     const KNOWN_BITS a = operand(t->left, type, levels), b = operand(t->right, type, levels);
     if (is_signed(type) && !(a.zeros & sign_bit(type) && b.zeros & sign_bit(type))) return {};
-    auto at_most = [type](uint64_t value) {
-        uint64_t below = value;
-        for (int s = 1; s < 64; s *= 2) below |= below >> s;
-        return KNOWN_BITS{mask_of(type) & ~below, 0};
-    };
     const uint64_t dividend = ~a.zeros & mask_of(type);
     if (t->op == MOD && t->right->op == ICON && b.ones && (b.ones | b.zeros) == mask_of(type))
-        return at_most(std::min(dividend, b.ones - 1));
-    return at_most(dividend);
+        return at_most(std::min(dividend, b.ones - 1), mask_of(type));
+    return at_most(dividend, mask_of(type));
 }
 
 KNOWN_BITS meet(KNOWN_BITS a, KNOWN_BITS b) { return {a.zeros & b.zeros, a.ones & b.ones}; }
@@ -114,6 +117,12 @@ KNOWN_BITS member(const NODE* t) {
     // The declared type says how the field extends; only one that is unsigned throughout is sure.
     if (!m->type->is_unsigned() || !t->type->is_unsigned()) return {};
     return {mask_of(t->type) & ~((uint64_t(1) << m->width) - 1), 0};
+}
+
+KNOWN_BITS variable(const NODE* t) {
+    if (!zeros_of_variables || !t->u.sym || t->u.sym->size != t->type->size) return {};
+    auto it = zeros_of_variables->find(t->u.sym);
+    return it == zeros_of_variables->end() ? KNOWN_BITS{} : KNOWN_BITS{it->second & mask_of(t->type), 0};
 }
 
 KNOWN_BITS truth_value(const TYPE* type) { return {mask_of(type) & ~uint64_t(1), 0}; }
@@ -167,6 +176,7 @@ KNOWN_BITS known(const NODE* t, int levels) {
     const TYPE* type = t->type;
     if (!is_integer(type)) return {};
     if (t->op == ICON) return of_constant(t->u.lval.value, mask_of(type));
+    if (t->op == NAME && !type->is_bool()) return variable(t);
     if (t->op == STDOT || t->op == STREF) return type->is_bool() ? truth_value(type) : member(t);
     if (type->is_bool() || boolean_result[t->op]) {
         KNOWN_BITS k = levels > 0 ? computed(t, levels - 1) : KNOWN_BITS{};
@@ -177,6 +187,12 @@ KNOWN_BITS known(const NODE* t, int levels) {
 }
 
 } // namespace
+
+const std::unordered_map<const SYMTAB*, uint64_t>* zeros_of_variables = nullptr;
+
+uint64_t known_zeros_as(const NODE* tree, const TYPE* type) {
+    return is_integer(type) ? operand(tree, type, MOST_LEVELS).zeros : 0;
+}
 
 KNOWN_BITS known_bits(const NODE* tree) { return known(tree, MOST_LEVELS); }
 

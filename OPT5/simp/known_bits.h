@@ -5,6 +5,7 @@
 #include "OPT5/simp/symbolic.h"
 
 #include <cstdint>
+#include <unordered_map>
 
 // Bits of a value at its type's width that are zero, or one, whatever the variables hold. A bit is in at most one mask.
 struct KNOWN_BITS {
@@ -15,6 +16,11 @@ struct KNOWN_BITS {
 // Of an integer or enumeration tree of at most 64 bits; nothing is known of another. Looks a fixed number of levels
 // deep, so that asking at every node of a tree stays linear.
 KNOWN_BITS known_bits(const NODE* tree);
+
+// The bits of variables that are zero in each value they hold, as whoever set this found; null at other times.
+extern const std::unordered_map<const SYMTAB*, uint64_t>* zeros_of_variables; // looked up only
+// Bits of the tree's value that are zero once it is converted to the type.
+uint64_t known_zeros_as(const NODE* tree, const TYPE* type);
 
 // The same as masks within the type's width; `type` is the tree's own.
 INT65 find_known_zeros(const NODE* tree, TYPE* type);

@@ -143,9 +143,42 @@ int looked_at(struct mode *p, struct mode *q) {
     return m.b;
 }
 
+// A mask goes that clears no bit of what any assignment gives the variables.
+// FUNCTION: masked
+// COUNT 1: & 7
+// COUNT 1: & 31
+// COUNT 0: & 63
+unsigned masked(const unsigned *p, int n) {
+    unsigned at = 2, flags = *p & 31, sum = 0;
+    for (int i = 0; i < n; i++) {
+        sum = sum * 3 + p[at & 15] + (flags * 2 & 63);
+        at = at + 1 & 7;
+        flags = (flags ^ at) & 31;
+    }
+    return sum;
+}
+
+// Not where one of them sets such a bit, what they are given is not known, or the sum carries into it.
+// FUNCTION: needed
+// COUNT 1: & 15
+// COUNT 1: & 7
+// COUNT 1: & 3
+unsigned needed(const unsigned *p, int n, unsigned given) {
+    unsigned at = 2, low = 1, sum = 0;
+    for (int i = 0; i < n; i++) {
+        sum = sum * 3 + p[at & 15] + (given & 7);
+        at = sum & 1 ? at << 1 : 3;
+        low = low + 1 & 3;
+        given += low;
+    }
+    return sum;
+}
+
 int main(void) {
+    static const unsigned table[16] = {5, 99, 3, 7000, 65535, 17, 4, 8, 21};
     struct flags t[2] = {{0, 1, 2, 3, 4}, {1, 3, 8191, -256, -64}};
     for (int i = -3; i < 12; i += 2) {
+        put_u32(masked(table + 3, i) ^ needed(table, i, 1000u * i));
         writes(t, i);
         put_i16(values(t, i * 77));
         put_i16(reads(t) + reads(t + 1) * 3);

@@ -1,5 +1,211 @@
-// Not built yet: nothing is known and nothing changes.
+// What the code generator is told of loops, and the entry points that do the work of a step in a frame of their own.
+//
+// The analysis for the code generator runs when registers have their variables: it brings even those that live in memory
+// into the form of references, builds the hierarchy, and keeps of each loop what its record says. Layout follows, so that the
+// records are settled behind it (loop_records.cpp).
 #include "OPT5/dd/dd.h"
 
-void do_dd_analysis_for_be() {}
-void finalize_dd_edges() {}
+#include "BITVEC/bitvec.h"
+#include "OPT5/alias/alias.h"
+#include "OPT5/dd/loop.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/scope.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/simpcfg.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/target/target.h"
+#include "UTIL/abort.h"
+
+#include <algorithm>
+
+namespace {
+
+bool is_told_of_loops() { return (float_support | 1) == 11; }
+
+void print_scopes() {
+    if (!fdebug) return;
+    if (currfuninfo->ls_root)
+        currfuninfo->ls_root->print(fdebug);
+    else
+        debug_printf("<<NULL SCOPE>>\n");
+}
+
+// Conditions that the program asserts have served.
+void delete_NASSERTs() {
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST** link = &bb->statements; *link;)
+            if ((*link)->first->op == NASSERT && *link != bb->last_statement())
+                drop_statement(link);
+            else
+                link = &(*link)->rest;
+    currfuninfo->has_nasserts = false;
+}
+
+// Copies of memory have no destinations to be wrapped on this target; pairs of clones that lost one, banks of memory, and
+// the dependence graph are not built yet.
+void wrap_memcpy_destinations() {}
+void unmark_singleton_clones(struct LOOP*) {}
+void write_dd_mbank_info() {}
+void write_dd_edges() {}
+
+// Deep sums keep the shape that the simplifier gave them.
+NODE* untower_tree(NODE* t) { return t; }
+
+void denormalize_for_output(bool keep_ddnodes) {
+    trees_are_normalized = false;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s; s = s->rest)
+            s->first = untower_tree(simp_tree(denormalize_tree(s->first, keep_ddnodes), nullptr));
+}
+
+void find_records(struct LOOP* root) {
+    wrap_memcpy_destinations();
+    init_dependence_analysis();
+    unmark_singleton_clones(root);
+    write_loop_icode(root);
+    write_dd_mbank_info();
+    write_dd_edges();
+    wrapup_dependence_analysis(true);
+}
+
+void remove_dead_assignments() {
+    need(fact::live_variables);
+    elim_dead_assigns(false, false);
+}
+
+} // namespace
+
+void do_dd_analysis_for_be() {
+    simpcfg(0, 0);
+    if (opt_level() < 2 || !is_told_of_loops()) return;
+    debug_printf("\n\n\t\t\t---------- ENTERING 'do_dd_analysis_for_be' -------\n");
+    if (print_debug) print_scopes();
+    do_dd_for_be = true;
+    normalize_all_trees();
+    rebuildcfg();
+    build_loop_hierarchy(false, false, false, 0);
+    if (currfuninfo->has_nasserts) {
+        delete_NASSERTs();
+        remove_dead_assignments();
+    }
+    elim_dd_dead_assignments = false;
+    struct LOOP* root = loop_root();
+    if (root) find_records(root);
+    denormalize_for_output(root != nullptr);
+    if (root) {
+        erase_virtual_inits(root);
+        unbuild_loop_hierarchy(); // pragmas go back first
+    }
+    changed(fact::graph);
+    if (elim_dd_dead_assignments) remove_dead_assignments();
+    do_dd_for_be = false;
+}
+
+// ---- Edges
+
+namespace {
+
+// The numbers of the accesses that still stand. A branch names labels alone on its right.
+BITVEC standing_accesses(const std::vector<CODE_EDGE>& edges) {
+    uint32_t largest = 0;
+    for (const CODE_EDGE& e : edges) largest = std::max({largest, e.from, e.to});
+    BITVEC standing(largest + 1);
+    for_each_tree(currfuninfo, [&](const NODE* tree) {
+        for_each_subtree(tree, [&](const NODE* t) {
+            if (t->op != DDNODE) return;
+            if (!t->rare().dd) optassert("tree->dval != NULL", __FILE__, __LINE__);
+            if (t->ddnode_id() <= largest) standing.set(t->ddnode_id());
+        });
+    });
+    return standing;
+}
+
+} // namespace
+
+void finalize_dd_edges() {
+    std::vector<CODE_EDGE>& edges = currfuninfo->code_records.edges;
+    if (edges.empty()) return;
+    const BITVEC standing = standing_accesses(edges);
+    std::vector<CODE_EDGE> kept;
+    for (CODE_EDGE& e : edges) {
+        if (standing.test(e.from) && standing.test(e.to)) {
+            kept.push_back(std::move(e));
+            continue;
+        }
+        debug_printf("\n\tDDEDGE from %d->%d omitted\n", e.from, e.to);
+        for (uint32_t id : {e.from, e.to})
+            if (!standing.test(id)) debug_printf("\t\tbecause DDNODE #%d is no longer present\n", id);
+    }
+    edges = std::move(kept);
+}
+
+void write_ldspec_advice() {}
+
+// ---- Entry points with a frame of their own
+
+namespace {
+
+void begin_frame() {
+    do_dd_for_be = false;
+    elim_dd_dead_assignments = false;
+    normalize_all_trees();
+}
+
+void end_frame() {
+    struct LOOP* root = loop_root();
+    denormalize_all_trees(false, true);
+    if (root) {
+        erase_virtual_inits(root);
+        unbuild_loop_hierarchy();
+    }
+    changed(fact::graph);
+}
+
+template <class F>
+void with_dependence(F work) {
+    init_dependence_analysis();
+    work();
+    wrapup_dependence_analysis(false);
+}
+
+} // namespace
+
+void do_dd_restructuring() {
+    simpcfg(0, 0);
+    if (opt_level() < 2) return;
+    debug_printf("\n\n\t\t\t---------- ENTERING 'do_dd_restructuring' ----------\n");
+    begin_frame();
+    rebuildcfg();
+    build_loop_hierarchy(false, false, true, -1);
+    if (struct LOOP* root = loop_root())
+        with_dependence([root] {
+            remove_dead_assignments();
+            collapse_dd_loops(root);
+            coalesce_dd_loops(root);
+        });
+    end_frame();
+    if (elim_dd_dead_assignments) remove_dead_assignments();
+}
+
+void do_dd_SSA_optimizations(bool constants, bool dead, bool promote) {
+    if (!constants && !dead && !promote) return;
+    debug_printf("\n\n\t\t\t-------- ENTERING 'do_dd_SSA_optimizations' --------\n");
+    split_qualified_parameter_copies();
+    begin_frame();
+    build_loop_hierarchy(false, true, true, -1);
+    if (loop_root() && (constants || dead))
+        with_dependence([=] {
+            construct_SSA_form(false, false, true);
+            if (constants) propagate_SSA_constants(1);
+            if (dead) eliminate_dead_SSA_assignments();
+            deconstruct_SSA_form();
+        });
+    if (loop_root() && promote) with_dependence([] { promote_vars_to_registers(true); });
+    end_frame();
+}

@@ -14,6 +14,7 @@ void report_all_dependences() {}
 void report_ambiguous_aliases(struct LOOP*) {}
 void undeltafy_dd_loops(struct LOOP*) {}
 void collapse_dd_loops(struct LOOP*) {}
+void coalesce_dd_loops(struct LOOP*) {}
 void sr_circular_addressing_in_loop(struct LOOP*) {}
 void sr_DIV_and_MOD_in_loop(struct LOOP*, bool) {}
 void do_loop_if_interchange(struct LOOP*) {}

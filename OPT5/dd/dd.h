@@ -38,6 +38,7 @@ void report_ambiguous_aliases(struct LOOP* loop);
 bool sink_unused_definitions(struct LOOP* loop);
 void undeltafy_dd_loops(struct LOOP* loop);
 void collapse_dd_loops(struct LOOP* loop);
+void coalesce_dd_loops(struct LOOP* loop);
 void sr_circular_addressing_in_loop(struct LOOP* loop);
 void sr_DIV_and_MOD_in_loop(struct LOOP* loop, bool recurse);
 void do_loop_if_interchange(struct LOOP* loop);
@@ -50,9 +51,18 @@ void explode_local_arrays();
 void special_DMAC_conversion();
 void rotate_loops_for_accumulators();
 
-// Dependence information for the code generator.
+// What the code generator is told (code_generator.cpp, loop_records.cpp): FUNINFO::code_records. The analysis keeps what
+// the hierarchy knows of loops; what it says of them is settled when the blocks have their final order. Edges of accesses
+// that went are dropped.
 void do_dd_analysis_for_be();
+void write_loop_icode(struct LOOP* root);
+void settle_loop_records();
 void finalize_dd_edges();
+void write_ldspec_advice();
+
+// Self-contained: with a frame of their own. No step of the table calls them.
+void do_dd_restructuring();
+void do_dd_SSA_optimizations(bool constants, bool dead, bool promote);
 
 // Self-check of the dependence vectors, for the debug stream.
 void do_DVE_unit_testing();

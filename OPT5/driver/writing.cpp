@@ -42,7 +42,7 @@ const ROW rows[] = {
     {F,     "allocate registers",     nullptr, always, allocate_regs, none, graph},
     {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, live_variables, graph},
     {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, graph},
-    {IDLE,  "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, none},
+    {F,     "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, graph},
     {F,     "last simpcfg",           nullptr, is_written, [] { simpcfg(1, 0); }, none, graph},
     {F,     "rotate loops",           nullptr, is_written, rotate_loops, none, graph},
     {F,     "straighten traces",      nullptr, is_written, straighten_traces_in_cfg, none, graph},
@@ -52,9 +52,9 @@ const ROW rows[] = {
     {FIXED, "machine state",          nullptr, is_written, strip_implicit_states, none, graph},
     {IDLE,  "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
     {IDLE,  "vectors for output",     nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
-    {IDLE,  "load speculation",       nullptr, is_written, finalize_ldspec_advice, none, none},
     {FIXED, "prune exception table",  nullptr, is_written, prune_exception_table, none, graph},
     {F,     "profile",                nullptr, is_written, [] { initialize_CFG_profiling_annotation(true, true); }, none, graph},
+    {F,     "loops for output",       nullptr, is_written, settle_loop_records, none, graph},
 };
 // clang-format on
 

@@ -167,6 +167,18 @@ void write_exception_table(FUNINFO* f) {
 
 } // namespace
 
+void finalize_ldspec_advice() {
+    for (const ldspec_tuple& t : currfuninfo->code_records.ldspec_advice) {
+        if (t.sym == mcall_implicit_state_symbol) continue;
+        OPT_ASSERT(t.kind == 0 || t.kind == 1);
+        if (t.kind == 0)
+            o_file->if_write_ldspec_induct(t.id, t.word, t.step, t.type, t.sym);
+        else
+            o_file->if_write_ldspec_rand(t.id, t.word, static_cast<uint32_t>(t.step), t.type, t.sym);
+    }
+    currfuninfo->code_records.ldspec_advice.clear();
+}
+
 void write_func_body() {
     FUNINFO* f = currfuninfo;
     forget_indexes(f);
@@ -179,6 +191,7 @@ void write_func_body() {
         debug_printf("%s is a leaf function\n", f->name.c_str());
     }
     write_register_assignments();
+    finalize_ldspec_advice();
     wrbblocks();
     write_exception_table(f);
     wrstcr(IFR_END_FUNC, f->end_psn);
@@ -263,8 +276,18 @@ void strip_implicit_states() {
     for (EHT_ITEM& item : f->eht) item.cleanup = rewrite_tree(item.cleanup, strip_implicit_state);
 }
 
+namespace {
+
+void write_code_records(const CODE_RECORDS& records) {
+    for (const CODE_LOOP& l : records.loops) o_file->if_write_loop(l.id, l.outer, l.min, l.max, l.factor, l.flags);
+    for (const CODE_EDGE& e : records.edges) o_file->if_write_dep_edge(e.from, e.to, e.vector);
+}
+
+} // namespace
+
 void write_function() {
     write_func_header();
+    write_code_records(currfuninfo->code_records);
     write_func_body();
 }
 

@@ -22,6 +22,7 @@ void write_end_of_unit();
 
 void write_func_header();
 void write_func_body();
+void finalize_ldspec_advice(); // the load speculation records
 void wrbblocks();
 void wrexpr(LIST* element);
 void wrbdlr(const LBL* labels);             // a label record for each label that is referenced

@@ -173,6 +173,25 @@ private:
     BBLK* bb;
 };
 
+// Tells of the first block, and of each behind one of another loop, which loop it lies in.
+class LOOP_PLACES {
+public:
+    explicit LOOP_PLACES(const CODE_RECORDS& function) : records(function) {}
+
+    void enter(const BBLK* bb) {
+        const uint32_t at = records.loop_at(bb->serial);
+        if (at == last || at == CODE_RECORDS::NOWHERE) return;
+        last = at;
+        const CODE_LOOP& loop = records.loops[at];
+        const bool is_written = loop.counter && loop.counter->index >= 0; // else it went with its last use
+        o_file->if_write_inloop(loop.id, is_written ? loop.counter : nullptr, loop.counter_flags);
+    }
+
+private:
+    const CODE_RECORDS& records;
+    uint32_t last = CODE_RECORDS::NOWHERE;
+};
+
 void write_entry_count(FUNINFO* f) {
     if (f->profile_status != 2 || f->entry_count == NO_PROFILE || find_pragma(currfunc, PRG_FUNC_NUM_CALLED)) return;
     int32_t largest = 0;
@@ -211,7 +230,9 @@ void wrbblocks() {
     if (print_debug && write_opt_info) prbbinfix(finfo);
     empty_unreached_spins(f);
     write_entry_count(f);
+    LOOP_PLACES places(f->code_records);
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
+        if (bb->statements) places.enter(bb);
         wrbdlr(bb->label);
         BLOCK_WRITER(bb).run();
     }

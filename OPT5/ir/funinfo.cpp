@@ -308,6 +308,7 @@ void erase_all() {
     for (SYMTAB* sym : f->dropped_syms) delete sym;
     f->dropped_syms.clear();
     f->stack_union = nullptr;
+    f->code_records = {};
     f->stack_is_laid_out = false;
     erase_ranges(f->widened);
     erase_ranges(f->shortened);

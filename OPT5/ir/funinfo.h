@@ -3,6 +3,7 @@
 #pragma once
 
 #include "IFILE/if_client.h"
+#include "OPT5/ir/code_records.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/list.h"
 #include "OPT5/ir/scope.h"
@@ -157,6 +158,7 @@ public:
     int32_t label_counters[2] = {0, 0}; // internal labels, counting down; chosen by `internal_label_index`
     int lva_sym_count = 0;
     void* hierarchy = nullptr;
+    CODE_RECORDS code_records;
     std::vector<NODE*> givens; // facts that hold in the whole function
     std::vector<std::string> comments;  // comment lines ahead of the function in the output
     std::vector<std::string> info_text; // buffered info text of the worker mode

@@ -36,7 +36,7 @@ int rtc_rpt_threshold;
 bool rtc_unified_memory, rtc_RPT_ok_for_loop;
 int cpu_version = -1;
 int max_threads = 0;
-bool do_int_MVP, do_IP_MVP, do_beta_MVP, trees_are_normalized, do_dd_for_be;
+bool do_int_MVP, do_IP_MVP, do_beta_MVP, trees_are_normalized, do_dd_for_be, elim_dd_dead_assignments;
 bool any_unions_in_program;
 int lex = 0;
 

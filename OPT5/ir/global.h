@@ -62,7 +62,7 @@ extern int rtc_rpt_threshold;
 extern bool rtc_unified_memory, rtc_RPT_ok_for_loop;
 extern int cpu_version; // silicon version, -1 until known
 extern int max_threads; // 0: serial
-extern bool do_int_MVP, do_IP_MVP, do_beta_MVP, trees_are_normalized, do_dd_for_be;
+extern bool do_int_MVP, do_IP_MVP, do_beta_MVP, trees_are_normalized, do_dd_for_be, elim_dd_dead_assignments;
 extern bool any_unions_in_program;
 extern int lex; // scope depth while reading
 

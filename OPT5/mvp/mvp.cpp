@@ -8,4 +8,3 @@ void init_IP_MVP_for_current_function() {}
 void add_MVP_IP_global_assertions() {}
 void beta_parms_using_mvp_ip() {}
 void beta_convert_using_mvp_ip() {}
-void finalize_ldspec_advice() {}

@@ -10,6 +10,3 @@ void init_IP_MVP_for_current_function();
 void add_MVP_IP_global_assertions();
 void beta_parms_using_mvp_ip();
 void beta_convert_using_mvp_ip();
-
-// Writes the load speculation records of the current function.
-void finalize_ldspec_advice();

@@ -3,8 +3,8 @@
 
 Every tests/programs/NAME.c is parsed and executed, and must print what the sums in expected.txt are of. It is then
 optimized at every level and at both ends of the size goal, with the checker between steps, executed, and compared line
-by line with the run before. What was optimized is optimized once more: an output is a valid input, and must still print
-the same.
+by line with the run before; what it says of loops is held against the run. What was optimized is optimized once more: an
+output is a valid input, and must still print the same.
 
 A line of expected.txt is a program, how many lines it prints, and a sum of each SECTION of these. --accept writes the
 sums of what the chosen programs print unoptimized; crosscheck.py asks another compiler whether they are right.
@@ -30,6 +30,7 @@ from zbench import Outcome, Tools, Trouble, difference  # noqa: E402
 LEVELS = ("off", "0", "1", "2", "3", "4")
 SIZE_GOALS = ("0", "5")
 CHECK, FRAMES = "--debug:validate", "--debug:idle_frames"
+TOLD_OF_LOOPS = "--float_support=fpu32"  # where records of loops are written
 EXPECTED = HERE / "expected.txt"
 SECTION = 16
 
@@ -76,6 +77,7 @@ def variants(levels, more=()):
     if "2" in levels:
         for goal in SIZE_GOALS:
             yield f"level 2 goal {goal}", ["--opt_level=2", f"--size_speed_goal={goal}", CHECK]
+        yield "level 2 loops", ["--opt_level=2", TOLD_OF_LOOPS, CHECK]
     for words in more:
         for level in levels:
             yield f"level {level} {' '.join(words)}", [f"--opt_level={level}", *words, CHECK]
@@ -88,7 +90,7 @@ def judge_variant(tools, unit, want, name, words, rounds=("", " again")):
         out = unit.with_name(f"{unit.stem}-{name.replace(' ', '-')}{round_.replace(' ', '-')}.if")
         try:
             tools.optimize(source, out, words)
-            found = difference(want, tools.execute(out))
+            found = difference(want, tools.execute(out, ["--check"]))
         except Trouble as trouble:
             found = str(trouble)
         if found:

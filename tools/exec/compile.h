@@ -107,6 +107,7 @@ private:
     std::vector<std::pair<uint32_t, const IC_NODE*>> jumps; // statement, label
     const IC_ITEM* exception_table = nullptr;
     std::unordered_map<uint32_t, uint32_t> labels;          // number to statement
+    uint32_t labelled = UINT32_MAX;                         // the statement of the last label
     std::vector<TRIP_PROMISE> promised;                     // of the loop whose head comes next
     std::string keyword;                                    // and its keyword in the source
     uint32_t loop = NO_LOOP;                                // the statements that come are in
@@ -168,5 +169,6 @@ private:
     void exceptions(const IC_ITEM& item);
     uint32_t target(uint32_t label);
     void promise(const PRAGMA& pragma);
+    void enter_loop(uint32_t id, uint32_t line);
     void resolve();
 };

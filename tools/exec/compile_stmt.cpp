@@ -48,7 +48,7 @@ STMT& COMPILER::add(STMT_KIND kind, uint32_t line) {
 }
 
 void COMPILER::define(uint32_t label) {
-    labels[label] = static_cast<uint32_t>(f->code.size());
+    labels[label] = labelled = static_cast<uint32_t>(f->code.size());
     for (TRIP_PROMISE& t : promised) {
         t.head = labels[label];
         t.tested_last = keyword == "do";
@@ -128,6 +128,14 @@ void COMPILER::statement(const IC_NODE* n, uint32_t line) {
         break;
     }
     case op::URETURN: s.kind = S_URETURN; break;
+    case op::UMCALL:
+        if (std::strcmp(n->text, "_never_executed") == 0) { // what stands behind does not follow it
+            s.kind = S_FAIL;
+            s.status = EXEC_UNREACHABLE;
+            s.text = "reached a place that is never executed";
+            break;
+        }
+        [[fallthrough]];
     default: {
         const XNODE* x = value(n);
         f->code[at].tree = x;
@@ -190,6 +198,16 @@ void COMPILER::resolve() {
     }
 }
 
+// The label of an outer loop's head and that of an inner one's are two places, though no statement stands between.
+void COMPILER::enter_loop(uint32_t id, uint32_t line) {
+    if (p.options.check && !f->loops.empty() && id != loop && labelled == f->code.size()) {
+        STMT& s = add(S_EXPR, line);
+        s.tree = constant(0);
+        s.cost = 0;
+    }
+    loop = id;
+}
+
 void COMPILER::function() {
     const IC_FUNC& source = *f->source;
     lay_out_frame();
@@ -212,7 +230,7 @@ void COMPILER::function() {
                 f->loops.push_back({w[0], w[1], w[2], w[3], w[4]});
             }
             break;
-        case IFR_LOOP_VAR: loop = item.facts->word[0]; break;
+        case IFR_LOOP_VAR: enter_loop(item.facts->word[0], line); break;
         case IFR_ASM:
             if (p.options.check && !is_comment(item.text)) {
                 STMT& s = add(S_FAIL, line);

@@ -18,6 +18,15 @@ for last; do :; done
 cp {other} $last
 """
 
+NEST = """#include <zrun.h>
+int f(int n, int m) { int i, j, s = 0;
+    for (i = 0; i < n; i++) {
+#pragma MUST_ITERATE(1, 9)
+        for (j = 0; j < m; j++) { put_i16(s); s += i * j; } }
+    return s; }
+int main(void) { put_i16(f(4, 3)); return 0; }
+"""
+
 
 class Zrun(unittest.TestCase):
     def setUp(self):
@@ -40,6 +49,16 @@ class Zrun(unittest.TestCase):
         self.assertEqual(kept, ["p.if", "p.opt.if", "p.opt.out", "p.out"])
         again = subprocess.run([ZRUN, self.folder / "kept" / "p.opt.if", "-o1"], stdout=subprocess.PIPE)
         self.assertEqual(again.returncode, 0)
+
+    def test_loops(self):
+        done = self.zrun("--opt_level=2", "--disable_inlining", "--float_support=fpu32", "--show", "--keep", self.folder, source=NEST)
+        self.assertEqual(done.returncode, 0, done.stderr)
+        told = [line for line in done.stdout.splitlines() if line.startswith("loop of ")]
+        self.assertEqual(len(told), 2, told)
+        self.assertRegex(told[0], r"^loop of _f: line 3 for, loop 1, \d.* iterations")
+        self.assertRegex(told[1], r"^loop of _f: line 5 for, loop 2 in 1, \d.* iterations.*, MUST_ITERATE\(1, 9")
+        dot = subprocess.run([os.environ["ICDUMP"], "--dot", self.folder / "p.opt.if"], stdout=subprocess.PIPE, text=True).stdout
+        self.assertRegex(dot, r"(?s)cluster_\d_1 \{\s*label=\"loop 1: [^}]*cluster_\d_2 \{\s*label=\"loop 2: [^}]*\}[^}]*\}")
 
     def test_different(self):
         self.assertEqual(self.zrun("--keep", self.folder, source=PROGRAM.replace("41", "42")).returncode, 0)

@@ -1,6 +1,7 @@
 // The call sites of a function: who is called, with what, and where it stands.
 #include "OPT5/ipa/inliner.h"
 
+#include "OPT5/ipa/copy_cfg.h"
 #include "OPT5/ipa/progana.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
@@ -27,7 +28,7 @@ std::string CALLSITE::description() const {
 int cost(const CALLSITE& site) {
     if (!site.callee) return 100000;
     const SYMTAB* sym = site.callee->symbol;
-    const int by_argument = sym && sym->type->has_params() ? 2 : 3;
+    const int by_argument = sym && sym->type->is_func() && sym->type->proto() ? 2 : 3;
     const int time = static_cast<int>(static_cast<float>(site.callee->est_time) / site.fold_ratio);
     return std::max(0, time - 2 - site.nargs * by_argument);
 }
@@ -59,15 +60,24 @@ bool pair_fits(const NODE* argument, TYPE* parameter) {
 
 } // namespace
 
+// Of a definition without a prototype its own parameters tell.
+static std::vector<TYPE*> parameter_types(const SYMTAB* callee) {
+    std::vector<TYPE*> types;
+    while (TYPE* t = type_of_nth_parameter(static_cast<int>(types.size()), callee)) types.push_back(t);
+    const FUNINFO* f = find_FUNINFO(const_cast<SYMTAB*>(callee));
+    if (!types.empty() || !f || (callee->type->is_func() && callee->type->proto())) return types;
+    for (const SYMTAB* s : parameters_in_order(f->saved_cfg ? *f->saved_cfg : *f)) types.push_back(s->type);
+    return types;
+}
+
 bool arguments_fit_parameters(const NODE* call, const SYMTAB* callee) {
     NODE* arguments = call->op == CALL ? call->right : nullptr;
-    const int count = arg_list_count(arguments);
-    int n = 0;
-    for (;; ++n) {
-        TYPE* parameter = type_of_nth_parameter(n, callee);
-        if (n == count || !parameter) return n == count && !parameter;
-        if (!pair_fits(arg_list_lookup(arguments, n), parameter)) return false;
-    }
+    const std::vector<TYPE*> parameters = parameter_types(callee);
+    const auto count = static_cast<size_t>(arg_list_count(arguments));
+    if (count != parameters.size()) return false;
+    for (size_t n = 0; n < count; ++n)
+        if (!pair_fits(arg_list_lookup(arguments, static_cast<int>(n)), parameters[n])) return false;
+    return true;
 }
 
 // ---- Collecting

@@ -9,6 +9,8 @@
 #include "OPT5/ir/walks.h"
 #include "UTIL/abort.h"
 
+#include <algorithm>
+
 namespace {
 
 // The function is the current one as long as the object lives.
@@ -170,6 +172,15 @@ private:
 } // namespace
 
 CFG_COPY copy_cfg(const FUNINFO& body, FUNINFO* owner) { return COPIER(body, owner).run(); }
+
+std::vector<SYMTAB*> parameters_in_order(const FUNINFO& body) {
+    std::vector<SYMTAB*> parameters;
+    for (SYMTAB* list : {body.new_syms, body.pending_syms, body.memory_syms, body.scalar_syms})
+        for (SYMTAB* s = list; s; s = s->next)
+            if (s->level == 1 && s->written_as_parameter) parameters.push_back(s);
+    std::sort(parameters.begin(), parameters.end(), [](const SYMTAB* a, const SYMTAB* b) { return a->depnum_m < b->depnum_m; });
+    return parameters;
+}
 
 void save_cfg(FUNINFO* f) {
     if (f->saved_cfg) return;

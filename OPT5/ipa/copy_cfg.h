@@ -23,5 +23,8 @@ struct CFG_COPY {
 // new. The copies of symbols lose `const`: what was set once for the function is set at each expansion.
 CFG_COPY copy_cfg(const FUNINFO& body, FUNINFO* owner);
 
+// The parameters of a body, in the order that arguments come in.
+std::vector<SYMTAB*> parameters_in_order(const FUNINFO& body);
+
 // Keeps a copy of the body as FUNINFO::saved_cfg, unless there is one.
 void save_cfg(FUNINFO* f);

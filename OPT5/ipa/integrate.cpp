@@ -345,10 +345,7 @@ void take_arguments(NODE* list, std::vector<NODE*>* arguments) {
 
 // The parameters' copies, in the order that arguments come in.
 std::vector<SYMTAB*> parameters_of(const FUNINFO* body, const CFG_COPY& copy) {
-    std::vector<SYMTAB*> list;
-    for (SYMTAB* s = body->memory_syms; s; s = s->next)
-        if (s->level == 1 && s->written_as_parameter) list.push_back(s);
-    std::sort(list.begin(), list.end(), [](const SYMTAB* a, const SYMTAB* b) { return a->depnum_m < b->depnum_m; });
+    std::vector<SYMTAB*> list = parameters_in_order(*body);
     for (SYMTAB*& s : list) s = copy.symbol_of.at(s);
     return list;
 }

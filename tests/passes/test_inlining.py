@@ -18,7 +18,7 @@ from run import Tools, difference
 DEPTH_LIMIT, MOST_NESTED, MOST_FORCED_DEEP = 10, 4000, 100000
 FORCED, DEEP, NEVER = "FORCEINLINE", "FORCEINLINE_RECURSIVE", "NOINLINE"
 WISHES = ("",) * 12 + (FORCED, DEEP, NEVER)
-SIZES = (5, 6, 9, 10, 11, 19, 20, 20, 21, 21, 60, 98, 99, 100, 101, 300)  # about the limits of the rules
+SIZES = (5, 6, 9, 10, 11, 19, 20, 20, 21, 21, 60, 98, 99, 100, 101)  # about the limits of the rules
 
 
 @dataclass
@@ -32,7 +32,9 @@ class Call:
 class Function:
     name: str
     stores: int
+    parameters: int = 1
     odd: bool = False
+    old_style: bool = False
     calls: list = field(default_factory=list)
     inline: bool = False
     external: bool = False
@@ -42,29 +44,64 @@ class Function:
 
     @property
     def size(self):
-        """A parameter to its variable: 2; a store: 2, of a constant: 3; a call with the parameter: 1; the end: 1."""
+        """The first parameter to its variable: 2; a store: 2, of a constant: 3; a call with it: 1; the end: 1."""
         return 2 + 2 * self.stores + 3 * self.odd + len(self.calls) + 1
 
     def fill(self, size):
+        self.stores, self.odd = 0, False
         rest = max(size - self.size, 2)
         self.odd = rest % 2 == 1 and rest > 3
         self.stores = (rest - 3 * self.odd) // 2
 
 
-def random_graph(rng, cyclic):
+def below_size(graph, i):
+    """What expanding everything below the function brings, without cycles."""
+    size = lambda j: 0 if graph[j].cannot else graph[j].size + below_size(graph, j)
+    return sum(size(call.callee) for call in graph[i].calls)
+
+
+def add_limits(seed, graph):
+    """Functions with one site each, or two, of sizes right at a limit."""
+    pick = lambda values, n=1: values[seed // n % len(values)]
+
+    def add(size, *callees, **marks):
+        f = Function(f"f{len(graph)}", 0, **marks)
+        f.calls = [Call(callee) for callee in callees]
+        f.fill(size - (below_size(graph + [f], len(graph)) if f.inline else 0))
+        graph.append(f)
+        return len(graph) - 1
+
+    add(pick((98, 99, 100)))
+    heavy, barred = add(300), add(30, cannot=True)
+    add(pick((499, 500, 501)), *pick(((), (barred,)), 3), inline=True)
+    add(7 * 300 + pick((10, 60, 80)), *[heavy] * 7, inline=True)
+    add(pick((1999, 2000, 2001)), pick((heavy, barred), 3), inline=True)
+    small = add(pick((19, 20, 21)), *pick(((), (barred,), (barred, heavy)), 3))
+    add(12, small, small)
+
+
+def random_graph(seed, cyclic):
     """main is the last function; without cycles a function calls those ahead of it."""
-    count = rng.randint(4, 14)
+    rng = random.Random(seed)
+    count = rng.randint(6, 16)
     inlines, graph = rng.choice((0.2, 0.7)), []
     for i in range(count):
-        f = Function(f"f{i}", 0)
+        f = Function(f"f{i}", 0, rng.choice((1, 1, 2, 3)))
         f.inline = rng.random() < inlines
         f.external = not f.inline and rng.random() < 0.15
-        f.always, f.cannot, f.taken = (rng.random() < p for p in (0.12, 0.08, 0.1))
+        f.always, f.cannot, f.taken = (rng.random() < p for p in (0.08, 0.08, 0.1))
+        f.parameters = 1 if f.taken else f.parameters
+        f.old_style = not cyclic and not f.taken and rng.random() < 0.2
         graph.append(f)
-        for _ in range(rng.choice((0, 0, 1, 1, 2, 3)) if i or cyclic else 0):
-            callee = rng.randrange(count if cyclic and rng.random() < 0.2 else max(i, 1))
-            f.calls.append(Call(callee, rng.choice(WISHES)))
+        for _ in range(rng.choice((0, 1, 1, 1, 2, 3)) if i or cyclic else 0):
+            callee = rng.randrange(count if cyclic and rng.random() < 0.25 else max(i, 1))
+            times = rng.choice((1, 1, 1, 2))
+            f.calls += [Call(callee, rng.choice(WISHES)) for _ in range(times)]
         f.fill(rng.choice(SIZES))
+    for f in graph:
+        if not f.inline and rng.random() < 0.4:
+            f.fill(rng.choice((98, 99, 100)) if not cyclic else 15)
+    add_limits(seed, graph)
     main, reached = Function("main", 0, external=True), set()
 
     def reach(i):
@@ -73,26 +110,62 @@ def random_graph(rng, cyclic):
             for call in graph[i].calls:
                 reach(call.callee)
 
-    for i in reversed(range(count)):
-        if i not in reached or rng.random() < 0.3:
+    for i in reversed(range(len(graph))):
+        if i not in reached or (i < count and rng.random() < 0.3):
             main.calls += [Call(i, rng.choice(WISHES)) for _ in range(rng.randint(1, 2))]
             reach(i)
     return graph + [main]
+
+
+@dataclass
+class Options:
+    level: int
+    auto: int = None
+    disabled: bool = False
+    single: bool = False
+    goal: int = None
+
+    @property
+    def words(self):
+        return [f"--opt_level={self.level}"] + [f"--auto_inline={self.auto}"] * (self.auto is not None) + \
+            ["--disable_inlining"] * self.disabled + ["--single_inline"] * self.single + \
+            [f"--size_speed_goal={self.goal}"] * (self.goal is not None)
+
+
+def all_cases():
+    """Seed, graph and options; one limit is what some function comes to with all of its calls, or one less."""
+    for seed in range(27):
+        rng = random.Random(-seed)
+        graph = random_graph(seed, seed % 4 == 3)
+        source_of(graph)  # gives the calls their lines
+        i = rng.randrange(len(graph) - 1)
+        sites = sum(call.callee == i for f in graph for call in f.calls)
+        limit = graph[i].size * (sites + rng.choice((0, 1, 2))) - rng.choice((0, 0, 1))
+        others = (Options(2, 60), Options(3, 0, single=True), Options(3, None, True), Options(3, 5, single=True),
+                  Options(2))
+        for options in (Options(2, goal=(1, 1, 1, 2, 0)[seed % 5]), Options(3), Options(3, limit), others[seed % len(others)]):
+            yield seed, graph, options
 
 
 def source_of(graph):
     lines = ["volatile int port;"]
     lines += [f"#pragma {name}({f.name})" for f in graph for name, wish in
               (("FUNC_ALWAYS_INLINE", f.always), ("FUNC_CANNOT_INLINE", f.cannot)) if wish]
-    head = lambda f: ("" if f.external else "static ") + ("inline " if f.inline else "") + f"void {f.name}(int a)"
-    lines += [head(f) + ";" for f in graph[:-1]]
+    def head(f):
+        names = "abc"[:f.parameters]
+        types = [f"int {name}" for name in names]
+        listed = f"({', '.join(names)}) {'; '.join(types)};" if f.old_style else f"({', '.join(types)})"
+        return ("" if f.external else "static ") + ("inline " if f.inline else "") + f"void {f.name}{listed}"
+
+    lines += [head(f) + ";" for f in graph[:-1] if not f.old_style]
     taken = [f.name for f in graph if f.taken]
     lines += [f"void (*const table[])(int) = {{{', '.join(taken)}}};"] if taken else []
     for f in graph:
         lines.append("int main(void) {" if f.name == "main" else head(f) + " {")
         for call in f.calls:
             lines += [f"#pragma {call.pragma}"] if call.pragma else []
-            lines.append(f"    {graph[call.callee].name}({'7' if f.name == 'main' else 'a'});")
+            arguments = ", ".join(["7" if f.name == "main" else "a"] * graph[call.callee].parameters)
+            lines.append(f"    {graph[call.callee].name}({arguments});")
             call.line = len(lines)
         lines += ["    port = a;"] * f.stores + ["    port = 1;"] * f.odd + (["    return 0;"] if f.name == "main" else []) + ["}"]
     return "\n".join(lines) + "\n"
@@ -101,9 +174,10 @@ def source_of(graph):
 class Prediction:
     """The rules by size, as they are meant."""
 
-    def __init__(self, graph, level, auto, disabled=False, single=False):
-        self.graph, self.level, self.disabled, self.single = graph, level, disabled, single
-        self.auto = auto if auto is not None else 20 if level >= 3 else 0
+    def __init__(self, graph, options):
+        self.graph, self.level, self.disabled, self.single = graph, options.level, options.disabled, options.single
+        level, auto, self.goal = options.level, options.auto, options.goal
+        self.auto = 20 if auto is None else auto
         self.main = len(graph) - 1
         everyone = range(len(graph))
         self.root = [f.external or f.taken for f in graph]  # the rest of the program is not known
@@ -112,6 +186,7 @@ class Prediction:
         self.follows = {c.callee for i in everyone for c in graph[i].calls if self.order[i] >= self.order[c.callee]}
         self.kept = {i for i, f in enumerate(graph) if self.root[i] or f.cannot or not (level > 2 or f.inline)}
         self.left, self.inlined, self.accepted, self.suppressed = list(self.callers), set(), {}, set()
+        self.time, self.costs, self.taken_in = [f.size for f in graph], {}, []
         self.decide()
         self.integrate()
 
@@ -173,16 +248,36 @@ class Prediction:
         sites = [(i, call) for i in sorted(self.order, key=self.order.get) for call in reversed(self.graph[i].calls)
                  if self.is_candidate(i, call)]
         sites.sort(key=lambda site: -self.order[site[1].callee])
+        most = 500 if self.goal is not None and self.goal < 2 else 2000
         for predicate in (self.forced,
-                          lambda c: self.graph[c.callee].inline and self.recursive_size(c.callee, 1) < 2000,
+                          lambda c: self.graph[c.callee].inline and self.recursive_size(c.callee, 1) < most,
                           lambda c: self.is_worth_it(c.callee)):
             for i, call in sites:
                 if call.line not in self.accepted and predicate(call):
                     self.accepted[call.line] = call
                     self.inlined.add(call.callee)
                     self.left[call.callee] -= 1
+                    self.grow(i, call)
                     if self.left[call.callee] == 0 and call.callee not in self.kept:
                         self.suppressed.add(call.callee)
+
+    def grow(self, i, call):
+        """The caller gets longer, and with it everything that it is part of; a callee that goes takes no time."""
+        j, f = call.callee, self.graph[call.callee]
+        cost = max(0, self.time[j] - 2 - f.parameters * (3 if f.old_style else 2))
+        self.costs[call.line] = cost
+
+        def add(to):
+            self.time[to] += cost
+            for caller, callee in self.taken_in:
+                if callee == to and self.order[caller] < self.order[to]:
+                    add(caller)
+
+        if self.time[i]:
+            add(i)
+        if self.left[j] == 0 and j not in self.kept:
+            self.time[j] = 0
+        self.taken_in.append((i, j))
 
     def integrate(self):
         saved, work = set(self.inlined), [c.callee for c in self.accepted.values() if self.forced(c) and c.pragma == DEEP]
@@ -228,6 +323,8 @@ class Choice(unittest.TestCase):
         text, dump = info.read_text(), self.tools.dump(out)
         accepted = {int(line) for line in re.findall(r"^\[accepted:  call from \S+ \(\S+:(\d+)\)", text, re.M)}
         self.assertEqual(accepted, set(prediction.accepted))
+        costs = dict(re.findall(r"candidate:  call from \S+ \(\S+:(\d+)\).* cost (\d+) temp", text))
+        self.assertEqual({line: int(costs[str(line)]) for line in accepted}, prediction.costs)
         for name, size in re.findall(r"^\[accepted: .*\) to _(\w+).* \(size (\d+) sites", text, re.M):
             self.assertEqual(int(size), next(f.size for f in graph if f.name == name), name)
         bodies = {name: set(re.findall(r"\b_(\w+)\(", body)) for name, body in
@@ -236,21 +333,17 @@ class Choice(unittest.TestCase):
         return out
 
     def test_random_call_graphs(self):
-        for seed in range(30):
-            rng = random.Random(seed)
-            cyclic = seed % 3 == 0
-            graph = random_graph(rng, cyclic)
-            source, unit = self.folder / "graph.c", self.folder / "graph.if"
-            source.write_text(source_of(graph))
-            self.tools.parse(source, unit)
-            others = ((2, 60, False, True), (3, 30, False, False), (3, None, True, False), (3, 5, False, True))
-            for level, auto, disabled, single in ((2, None, False, False), (3, None, False, False), others[seed % 4]):
-                words = [f"--opt_level={level}"] + [f"--auto_inline={auto}"] * (auto is not None) + \
-                    ["--disable_inlining"] * disabled + ["--single_inline"] * single
-                with self.subTest(seed=seed, words=words):
-                    out = self.check(graph, unit, words, Prediction(graph, level, auto, disabled, single))
-                    if not cyclic and level == 3:
-                        self.assertEqual(self.tools.execute(out).status, 0)
+        parsed = None
+        source, unit = self.folder / "graph.c", self.folder / "graph.if"
+        for seed, graph, options in all_cases():
+            if parsed != seed:
+                source.write_text(source_of(graph))
+                self.tools.parse(source, unit)
+                parsed = seed
+            with self.subTest(seed=seed, options=options):
+                out = self.check(graph, unit, options.words, Prediction(graph, options))
+                if seed % 4 != 3 and options.level == 3:
+                    self.assertEqual(self.tools.execute(out).status, 0)
 
     def test_each_strategy(self):
         tight = ",inline_static_limit=101,inline_small_limit=1"

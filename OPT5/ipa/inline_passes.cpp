@@ -191,7 +191,7 @@ void INLINE_FILE::pass(const SITES& sites, const SITE_PREDICATE& predicate, cons
         OPT_ASSERT(caller != NULL);
         TRIAL trial;
         std::vector<uint32_t> before;
-        if (is_validating()) before = estimates_of(functions);
+        if (limits.any() && is_validating()) before = estimates_of(functions);
         apply(site, &trial);
         const auto quadratic = static_cast<long>(quadratic_m);
         const auto linear = static_cast<int>(linear_m);

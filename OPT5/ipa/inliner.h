@@ -55,6 +55,7 @@ struct INLINE_LIMITS {
     int64_t quadratic = 0; // of the sum of squared times; 0: none, as for the others
     int64_t linear = 0;
     uint32_t loops = 0, blocks = 0;
+    bool any() const { return quadratic > 0 || linear > 0 || loops || blocks; }
 };
 
 // The functions of the file, their sites, and the sums of their times.

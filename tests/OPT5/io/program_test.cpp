@@ -138,6 +138,22 @@ TEST_F(ProgramTest, RecursionIsFoundAlongCyclesAndThroughTheOutside) {
     EXPECT_EQ(count(text, "\nThese external functions are called but not defined here:\n\t_outside()\n"), 1) << text;
 }
 
+TEST_F(ProgramTest, AnyCountOfFunctionsIsNumbered) {
+    constexpr int count_of_functions = 33000;
+    IC_SYMBOL* below = declare("_f0");
+    returns(below, icon(3));
+    for (int i = 1; i < count_of_functions; ++i) {
+        IC_SYMBOL* f = declare(("_f" + std::to_string(i)).c_str());
+        returns(f, call(below));
+        below = f;
+    }
+    begin_main();
+    ret(call(below));
+    end();
+    const std::string text = info({"--opt_level=3", "--disable_inlining"});
+    EXPECT_EQ(count(text, "recursive") + count(text, "is not called"), 0);
+}
+
 TEST_F(ProgramTest, AModeThatNeedsAnEntryRevertsWithoutOne) {
     returns(declare("_f", 2), icon(1));
     const std::string text = info({"--opt_level=3", "--call_assumptions=2"});

@@ -121,7 +121,11 @@ public:
         if (!old->type->is_int() || old->type->size <= tp->int_t->size || !only_its_name_reaches(old) || sym_appears_in_EHT(old)) return false;
         const auto course = course_of(iv, loop);
         if (!course || !course->fits(type)) return false;
-        const auto last = range_of(iv->last, loop);
+        auto last = range_of(iv->last, loop);
+        if (last && iv == loop->LCV && first_test_holds(loop)) { // it lies behind the start
+            if (iv->has(IV_increases)) last->low = std::max(last->low, course->low);
+            if (iv->has(IV_decreases)) last->high = std::min(last->high, course->high);
+        }
         return last && last->fits(type) && has_only_updates();
     }
 
@@ -188,12 +192,19 @@ private:
         NODE **wide = is_widened(n->left) ? &n->left : &n->right, **other = wide == &n->left ? &n->right : &n->left;
         if (!is_widened(*wide) || (*other)->type->is_unsigned() != type->is_unsigned()) return n;
         const auto r = range_of(*other, loop);
-        if (!r || !r->fits(type)) return n;
+        if (!(r && r->fits(type)) && !is_limit(*other)) return n;
         NODE* cast = *wide;
         *wide = cast->left;
         erase_node(cast);
         *other = simp_tree(coerce_to_type(type, *other), loop);
         return n;
+    }
+
+    bool is_limit(const NODE* t) const {
+        NODE* limit = denormalized_copy(iv->last);
+        const bool is = iv == loop->LCV && trees_are_congruent(t, limit, false);
+        erase_tree(limit);
+        return is;
     }
 
     void update_records() {

@@ -1,9 +1,11 @@
 // Promises of trip counts and facts of loops in their normal forms, on records made by hand.
+#include "../ir/function_fixture.h"
 #include "../simp/expression_parser.h"
 
 #include "IFILE/pragma.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/loop_callbacks.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 
@@ -162,6 +164,75 @@ TEST_F(Promises, FactsHaveANormalForm) {
     for (const auto& row : rows) {
         EXPECT_EQ(facts_after(row.asserted), row.facts) << row.asserted[0];
     }
+}
+
+// ---- Into the text and back
+
+class LoopPragmas : public FunctionTest {
+protected:
+    void SetUp() override {
+        FunctionTest::SetUp();
+        static const bool once = (init_BIF_descriptors(), init_simplifier(), true);
+        (void)once;
+        SYMTAB* c = local("c");
+        assign(c, 1);
+        define(1);
+        assign(c, 2);
+        branch_if(c, 1, 2);
+        define(2);
+        ret(c);
+        build();
+    }
+    // The kinds ahead of the loop, in order, each with its first argument; flags are the hierarchy's own.
+    static std::vector<std::pair<int, std::string>> pragmas() {
+        std::vector<std::pair<int, std::string>> found;
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (const LIST* s = bb->statements; s; s = s->rest)
+                if (s->first->op == PPRAGMA && s->first->pragma->kind != PRG_LOOP_FLAGS)
+                    found.emplace_back(s->first->pragma->kind, get_PPRAGMA_tree_arg(s->first, 0));
+        return found;
+    }
+    static void put(int kind, const WORDS& args) { // the last ahead of the loop
+        LIST** link = &currfuninfo->bb_list->statements;
+        while ((*link)->rest) link = &(*link)->rest;
+        insert_before(link, set_PPRAGMA_tree_info(nullptr, kind, args), nullptr);
+    }
+};
+
+TEST_F(LoopPragmas, ComeOutOnceInTheirOrder) {
+    const int order[] = {125, 124, 123, 112, 66, 67, 65, 64, 63, 56, 68, 41, 38, 37, 39, 40, 121, 80, 60, 60, 42, 43, 44};
+    std::vector<std::pair<int, std::string>> want;
+    for (int kind : order) want.emplace_back(kind, std::to_string(1000 + want.size()));
+    want[11].second = "7"; // a line
+    want[14].second = "3";
+    for (size_t i = want.size(); i > 0; --i)
+        if (want[i - 1].first != 60) put(want[i - 1].first, {want[i - 1].second});
+    for (const auto& [kind, arg] : want)
+        if (kind == 60) put(kind, {arg});
+    for (int n = 0; n < 2; ++n) {
+        build_loop_hierarchy(false, false, false, 1);
+        ASSERT_NE(loop_root(), nullptr);
+        EXPECT_TRUE(pragmas().empty());
+        unbuild_loop_hierarchy();
+        EXPECT_EQ(pragmas(), want);
+    }
+}
+
+TEST_F(LoopPragmas, OfALoopThatIsGone) {
+    put(PRG_SRC_LOOP, {"1", "", "1", "for"});
+    put(PRG_MUST_ITERATE, {"7", "7", "1"});
+    put(PRG_SRC_LOOP, {"2", "", "2", "for"});
+    put(PRG_MUST_ITERATE, {"3", "9", "3"});
+    build_loop_hierarchy(false, false, false, 1);
+    struct LOOP* loop = nullptr;
+    for_each_subloop(loop_root(), [&loop](struct LOOP* l) { loop = l; });
+    ASSERT_NE(loop, nullptr);
+    EXPECT_EQ(loop->mustIterate->pragma->args, (WORDS{"3", "9", "3"}));
+    EXPECT_EQ(loop->sourceStart.line, 2);
+    delete_pragmas_for_loop(loop);
+    EXPECT_EQ(loop->mustIterate, nullptr);
+    EXPECT_EQ(loop->sourceLoopPragma, nullptr);
+    EXPECT_TRUE(pragmas().empty());
 }
 
 } // namespace

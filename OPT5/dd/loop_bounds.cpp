@@ -166,7 +166,10 @@ public:
         case STDOT:
         case ACONV: {
             const NODE* object = object_of_place(t->left);
-            return visit(object->op == UMULT ? object->left : object->op == NAME ? nullptr : object);
+            if (object->op == NAME) return;
+            if (object->op != UMULT) return visit(object);
+            visit(object->left);
+            return visit(object->right);
         }
         case ANDAND:
         case OROR:
@@ -185,7 +188,9 @@ private:
 
     void use(const NODE* access) {
         LINEAR_FORM sum(64);
-        if (access->type->is_func() || access->type->is_array() || access->type->size == 0 || access->type->size % UNIT || !read_exact_sum(access->left, 1, &sum)) return;
+        if (access->type->is_func() || access->type->is_array() || access->type->size == 0 || access->type->size % UNIT || !read_exact_sum(access->left, 1, &sum) ||
+            (access->right && !read_exact_sum(access->right, 1, &sum)))
+            return;
         const SYMTAB* object = nullptr;
         LOOPIV* iv = nullptr;
         int64_t by = 0;

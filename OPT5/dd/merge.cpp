@@ -319,7 +319,8 @@ bool MERGE::counter_can_go(const LOOP_TEST& test) {
     if (constant_trip_count(test, &last) < 0) {
         // A limit that is met exactly, or passed before the first test.
         if (test.stay_op != NEQ && !(is_up && by == 1) && !(is_down && by == -1)) return false;
-        if (test.step_comes_first && !test.counter->start_is_known) return false;
+        // The first step of an unsigned one may wrap.
+        if (test.step_comes_first && !test.counter->start_is_known && sym->type->is_unsigned()) return false;
         // One more than the greatest value there is would be met at once.
         if ((test.stay_op == ULE || test.stay_op == UGE) && sym->type->size == 32) return false;
     }
@@ -614,6 +615,7 @@ NODE* MERGE::last_address(const LOOP_TEST& test, const GROUP& g) {
     }
     if (facts.is_guarded(test)) return address;
     NODE* value = i.start_is_known ? mk_ICON(INT65(first), type) : mk_NAME(i.sym);
+    if (test.step_comes_first && !i.start_is_known) value = maketree(PLUS, value, mk_ICON(INT65(by), type), type);
     NODE* runs = maketree(test.stay_op, value, copy_tree(test.limit), tp->int_t);
     NODE* at_first = mk_NAME(g.sym);
     if (test.step_comes_first) at_first = maketree(PLUS, at_first, mk_ICON(INT65(k * by), tp->long_t), g.type);

@@ -128,6 +128,16 @@ long tested_late(unsigned long u, unsigned long n) {
     return s;
 }
 
+// A signed one does not wrap: the first test may leave, or the last value is met.
+// FUNCTION: tested_late_signed
+// COUNT 0: i += 1
+long tested_late_signed(int i, int n) {
+    long s = 0;
+    do s = s * 3 + a[i + 1];
+    while (++i < n);
+    return s;
+}
+
 // FUNCTION: kept_volatile
 // COUNT 0: $O$P0 +=
 long kept_volatile(int n) {
@@ -195,7 +205,7 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
 // A pointer of an inner loop with a known trip count continues from where that loop left it; not where it may be left early,
 // where the outer counter steps ahead of it, or where the count is not known.
 // FUNCTION: nests
-// COUNT 4: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
+// COUNT 5: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
 long nests(int n, int k) {
     long s = 0;
     for (int i = 0; i < 8; i++)
@@ -339,6 +349,7 @@ int main(void) {
     put_i16(found(203));
     put_i32(wraps(3, w, 1) + bounded(9) + kept_volatile(9) + kept_aliased(9) + promised(4));
     put_i32(changing_steps(60) + tested_late(-1UL, 5) * 7 + tested_late(9, 5));
+    for (int i = 0; i < 4; i++) put_i32(tested_late_signed(i, 2) ^ tested_late_signed(i + 9, 13));
     kept_apart(a, b, 30);
     put_i16(b[29] + b[3]);
     put_i32(nests(8, 3));

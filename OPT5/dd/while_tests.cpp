@@ -90,27 +90,11 @@ NODE* decided_first_test(struct LOOP* loop) {
     return holds ? mk_ICON(INT65(1), tp->int_t) : nullptr;
 }
 
-// The tail gets the head's first statement, if that has two, and a copy of its test in place of the branch.
-void copy_test_to_tail(struct LOOP* loop, BBLK* body, BBLK* exit) {
-    BBLK *head = loop->head, *tail = loop->tail;
-    NODE** side = staying_side(head->branch()->left, loop);
-    NODE* decided = decided_first_test(loop);
-    debug_printf("\n\tReplicating WHILE loop test (loop #%d):\n\t%s\n\n", loop->uid, tree_to_infix(head->branch()->left).c_str());
-    if (head->statements->rest) insert_at_end_of_body(tail, copy_tree(head->statements->first));
-    keep_in_temporary(side, loop);
-    LIST* last = tail->last_statement();
-    erase_tree(last->first);
-    last->first = copy_tree(head->branch());
-    change_successors(tail, {{head, body}});
-    connect(tail, exit);
-    edges_were_changed(currfuninfo);
-    if (decided) {
-        NODE* branch = head->branch();
-        erase_tree(branch->left);
-        branch->left = decided;
-    }
-    debug_printf("\n\tNew WHILE loop:\n\n");
-}
+struct REPLICATION {
+    struct LOOP* loop;
+    BBLK *body, *exit;
+    NODE* decided; // what the first test is, if that is known; owned
+};
 
 // A variable that is tested for truth is compared with 0.
 void compare_variable(NODE* test) {
@@ -120,22 +104,46 @@ void compare_variable(NODE* test) {
     test->left = maketree(NEQ, variable, mk_ICON(INT65(0), type), tp->int_t);
 }
 
-bool replicate(struct LOOP* loop) {
+bool is_replicable(struct LOOP* loop, REPLICATION* r) {
     if (has_shape(loop)) compare_variable(loop->head->branch());
     if (!has_shape(loop) || !staying_side(loop->head->branch()->left, loop)) return false;
     const NODE* targets = loop->head->branch()->right;
     BBLK *yes = targets->left->lbl->bblock, *no = targets->right->lbl->bblock;
     const bool yes_stays = loop_is_subloop_of_loop(yes->loop, loop, true), no_stays = loop_is_subloop_of_loop(no->loop, loop, true);
     if (yes_stays == no_stays) return false;
-    copy_test_to_tail(loop, yes_stays ? yes : no, yes_stays ? no : yes);
+    *r = {loop, yes_stays ? yes : no, yes_stays ? no : yes, decided_first_test(loop)};
     return true;
+}
+
+// The tail gets the head's first statement, if that has two, and a copy of its test in place of the branch.
+void copy_test_to_tail(const REPLICATION& r) {
+    BBLK *head = r.loop->head, *tail = r.loop->tail;
+    NODE** side = staying_side(head->branch()->left, r.loop);
+    debug_printf("\n\tReplicating WHILE loop test (loop #%d):\n\t%s\n\n", r.loop->uid, tree_to_infix(head->branch()->left).c_str());
+    if (head->statements->rest) insert_at_end_of_body(tail, copy_tree(head->statements->first));
+    keep_in_temporary(side, r.loop);
+    LIST* last = tail->last_statement();
+    erase_tree(last->first);
+    last->first = copy_tree(head->branch());
+    change_successors(tail, {{head, r.body}});
+    connect(tail, r.exit);
+    edges_were_changed(currfuninfo);
+    if (NODE* branch = head->branch(); r.decided) {
+        erase_tree(branch->left);
+        branch->left = r.decided;
+    }
+    debug_printf("\n\tNew WHILE loop:\n\n");
 }
 
 } // namespace
 
+// First tests are looked at while the graph stands.
 bool replicate_while_tests(struct LOOP* root) {
-    bool changed = false;
+    std::vector<REPLICATION> found;
+    keep_symbol_values(true);
     for (struct LOOP* loop : loops_inner_first(root))
-        if (!loop->is_root()) changed |= replicate(loop);
-    return changed;
+        if (REPLICATION r; !loop->is_root() && is_replicable(loop, &r)) found.push_back(r);
+    keep_symbol_values(false);
+    for (const REPLICATION& r : found) copy_test_to_tail(r);
+    return !found.empty();
 }

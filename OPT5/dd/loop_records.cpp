@@ -60,6 +60,7 @@ public:
 
     void run() {
         if (!found.has_other_cycles()) order_loops();
+        find_last_inside();
         for (const NATURAL_LOOP* loop : loops) known.push_back(known_as(loop));
         for (uint32_t k : known)
             if (k != CODE_RECORDS::NOWHERE) ++takers[k];
@@ -81,11 +82,16 @@ private:
         }
     }
 
-    bool is_in(uint32_t loop, uint32_t outer) const {
-        for (; loop != outer; loop = records.loops[loop].outer)
-            if (loop == records.loops[loop].outer) return false;
-        return true;
+    // Ids of the hierarchy count its tree depth first: those in a loop follow it without a gap.
+    void find_last_inside() {
+        last_inside.resize(records.loops.size());
+        for (size_t i = 0; i < last_inside.size(); ++i) last_inside[i] = static_cast<uint32_t>(i);
+        for (size_t i = last_inside.size(); i-- > 1;) {
+            uint32_t& around = last_inside[records.loops[i].outer];
+            around = std::max(around, last_inside[i]);
+        }
     }
+    bool is_in(uint32_t loop, uint32_t outer) const { return outer <= loop && loop <= last_inside[outer]; }
 
     // The loop of the hierarchy that this one is, or NOWHERE.
     uint32_t known_as(const NATURAL_LOOP* loop) const {
@@ -122,6 +128,7 @@ private:
 
     CODE_RECORDS& records;
     const NATURAL_LOOPS& found;
+    std::vector<uint32_t> last_inside;      // by id of the hierarchy
     std::vector<const NATURAL_LOOP*> loops; // outer ones first
     std::vector<uint32_t> known;            // by loop
     std::map<uint32_t, int> takers;

@@ -57,6 +57,7 @@ void dump_loop(const struct LOOP* loop) {
     if (loop->has(LOOP_conservative)) debug_printf(" | LOOP IS conservatively aligned and/or aliased");
     if (loop->has(LOOP_has_trip_predicate)) debug_printf(" | LOOP HAS TRIPCOUNT PRED");
     if (loop->irreducible) debug_printf("  irreducible");
+    if (!loop->is_root() && !loop->is_bottom_tested()) debug_printf("  top-tested");
     debug_printf("\n");
     dump_place("SOURCE START:", loop->sourceStart, indent);
     dump_place("SOURCE END:", loop->sourceEnd, indent);

@@ -96,16 +96,18 @@ struct REPLICATION {
     NODE* decided; // what the first test is, if that is known; owned
 };
 
-// A variable that is tested for truth is compared with 0.
-void compare_variable(NODE* test) {
-    NODE* variable = test->left;
-    if (variable->op != NAME || !variable->type->is_int()) return;
-    TYPE* type = variable->type->stqs();
-    test->left = maketree(NEQ, variable, mk_ICON(INT65(0), type), tp->int_t);
+// What is tested for truth is compared with 0: a variable, or one behind a step, n + 1, which is n != -1.
+void compare_with_zero(NODE* test) {
+    NODE* value = test->left;
+    if (!value->type->is_int() || value->type->is_bool() || (value->op != NAME && value->op != PLUS && value->op != MINUS)) return;
+    TYPE* type = value->type->stqs();
+    NODE* t = value->op == NAME ? maketree(NEQ, value, mk_ICON(INT65(0), type), tp->int_t)
+                                : simp_tree(maketree(NEQ, value, mk_ICON(INT65(0), type), tp->int_t), nullptr);
+    test->left = t;
 }
 
 bool is_replicable(struct LOOP* loop, REPLICATION* r) {
-    if (has_shape(loop)) compare_variable(loop->head->branch());
+    if (has_shape(loop)) compare_with_zero(loop->head->branch());
     if (!has_shape(loop) || !staying_side(loop->head->branch()->left, loop)) return false;
     const NODE* targets = loop->head->branch()->right;
     BBLK *yes = targets->left->lbl->bblock, *no = targets->right->lbl->bblock;

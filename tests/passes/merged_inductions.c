@@ -266,7 +266,7 @@ int apart(const int *x, int n) {
 // FUNCTION: beside
 // COUNT 1: n -=
 // COUNT 0: i +=
-// COUNT 0: m -=
+// COUNT 1: m -=
 // COUNT 0: k -=
 long beside(const int *p, const long *q, int n, unsigned u) {
     long s = u, i;

@@ -410,11 +410,22 @@ private:
             return;
         if (print_debug)
             debug_printf("\tUsing %s\n\tto fold loop guard for loop #%d:\n", stmt2infix(pragma).c_str(), loop->uid);
+        keep_as_assertion(guard->left);
         guard->left = mk_COMMAOP(guard->left, mk_ICON(INT65(guard_chooses ? 1 : 0), tp->int_t));
         if (print_debug) debug_printf("\t  ==>\t%s\n", tree_to_infix(guard->left).c_str());
         guard = nullptr;
     }
 
+    // What the guard would have shown is said behind it.
+    void keep_as_assertion(const NODE* condition) {
+        if (tree_has_side_effects(condition) || count_nodes_in_tree(condition) > MOST_NODES) return;
+        NODE* fact = copy_tree(condition);
+        if (!guard_chooses) fact = invert_boolean_tree(fact);
+        insert_at_end_of_body(loop->preheader, maketree(NASSERT, fact, nullptr, tp->int_t));
+        currfuninfo->has_nasserts = true;
+    }
+
+    static constexpr int MOST_NODES = 32;
     struct LOOP* const loop;
     std::vector<const NODE*> behind; // statements between the place of the walk and the loop, the last first
     NODE* guard = nullptr; // the first IF behind the place of the walk, if one side of it is the preheader

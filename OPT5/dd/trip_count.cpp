@@ -396,17 +396,23 @@ bool first_test_holds(const struct LOOP* loop) {
     }
     bool holds = false, named_lives = true, entry_lives = true;
     int budget = 200;
+    auto is_implied = [&](const NODE* by, bool sense) {
+        auto implies = [&](const OWNED_TREE& q) { return pred_implies_pred(by, sense, q.get()) == 1; };
+        return !tree_has_side_effects(by) && ((named_lives && implies(named)) || (entry_lives && (implies(entry) || implies(simplified))));
+    };
     for_each_block_ahead(loop, [&](const BBLK* bb, const NODE* test, bool sense) {
         if (test) {
             if (tree_has_side_effects(test->left)) return false;
-            auto implies = [&](const OWNED_TREE& q) { return pred_implies_pred(test->left, sense, q.get()) == 1; };
-            holds = (named_lives && implies(named)) || (entry_lives && (implies(entry) || implies(simplified)));
-            if (holds) return false;
+            if ((holds = is_implied(test->left, sense))) return false;
         }
-        for (const LIST* s = bb->statements; s; s = s->rest) {
+        std::vector<const NODE*> trees;
+        for (const LIST* s = bb->statements; s; s = s->rest) trees.push_back(s->first);
+        for (size_t i = trees.size(); i > 0; --i) {
             if (--budget < 0) return false;
-            named_lives = named_lives && !tree_modifies_lvalue_in_tree(s->first, named.get());
-            entry_lives = entry_lives && !tree_modifies_lvalue_in_tree(s->first, entry.get());
+            const NODE* t = trees[i - 1];
+            if (t->op == NASSERT && (holds = is_implied(t->left, true))) return false;
+            named_lives = named_lives && !tree_modifies_lvalue_in_tree(t, named.get());
+            entry_lives = entry_lives && !tree_modifies_lvalue_in_tree(t, entry.get());
         }
         return named_lives || entry_lives;
     });

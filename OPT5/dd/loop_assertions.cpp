@@ -306,6 +306,12 @@ public:
     explicit LINE_AHEAD(struct LOOP* l) : loop(l) {}
 
     void walk() {
+        walk_line();
+        if (kept) insert_at_end_of_body(guard_block, kept);
+    }
+
+private:
+    void walk_line() {
         BBLK* bb = loop->preheader;
         for (;;) {
             if (!walk_back(bb)) return;
@@ -317,7 +323,6 @@ public:
         }
     }
 
-private:
     bool walk_back(BBLK* bb) {
         std::vector<LIST**> links;
         for (LIST** link = &bb->statements; *link && (*link)->rest; link = &(*link)->rest) links.push_back(link);
@@ -387,7 +392,7 @@ private:
         return simp_for_control(condition, loop->parent);
     }
 
-    void pass_test(const BBLK* test, const BBLK* to) {
+    void pass_test(BBLK* test, const BBLK* to) {
         NODE* t = test->branch();
         if (!t || t->op == BRANCH) return;
         guard = nullptr;
@@ -399,7 +404,7 @@ private:
         if (!tree_has_side_effects(condition)) condition = simp_for_control(condition, loop->parent);
         assume(condition);
         behind.push_back(t->left);
-        if (to == loop->preheader) guard = t, guard_chooses = on_true == to;
+        if (to == loop->preheader) guard = t, guard_block = test, guard_chooses = on_true == to;
     }
 
     // The loop is entered for certain, as its source says.
@@ -416,12 +421,12 @@ private:
         guard = nullptr;
     }
 
-    // What the guard would have shown is said behind it.
+    // What the guard would have shown is said ahead of it.
     void keep_as_assertion(const NODE* condition) {
         if (tree_has_side_effects(condition) || count_nodes_in_tree(condition) > MOST_NODES) return;
         NODE* fact = copy_tree(condition);
         if (!guard_chooses) fact = invert_boolean_tree(fact);
-        insert_at_end_of_body(loop->preheader, maketree(NASSERT, fact, nullptr, tp->int_t));
+        kept = maketree(NASSERT, fact, nullptr, tp->int_t);
         currfuninfo->has_nasserts = true;
     }
 
@@ -429,6 +434,8 @@ private:
     struct LOOP* const loop;
     std::vector<const NODE*> behind; // statements between the place of the walk and the loop, the last first
     NODE* guard = nullptr; // the first IF behind the place of the walk, if one side of it is the preheader
+    BBLK* guard_block = nullptr;
+    NODE* kept = nullptr; // an assertion for that block
     bool guard_chooses = false;
     bool of_others = false; // the pragmas further ahead
 };

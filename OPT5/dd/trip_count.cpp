@@ -401,10 +401,7 @@ bool first_test_holds(const struct LOOP* loop) {
         return !tree_has_side_effects(by) && ((named_lives && implies(named)) || (entry_lives && (implies(entry) || implies(simplified))));
     };
     for_each_block_ahead(loop, [&](const BBLK* bb, const NODE* test, bool sense) {
-        if (test) {
-            if (tree_has_side_effects(test->left)) return false;
-            if ((holds = is_implied(test->left, sense))) return false;
-        }
+        if (test && (holds = is_implied(test->left, sense))) return false;
         std::vector<const NODE*> trees;
         for (const LIST* s = bb->statements; s; s = s->rest) trees.push_back(s->first);
         for (size_t i = trees.size(); i > 0; --i) {

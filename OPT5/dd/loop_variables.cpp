@@ -37,6 +37,12 @@ void for_each_block(struct LOOP* top, F&& visit) {
             if (bb->loop == loop) visit(bb);
 }
 
+// A statement in normal form, simplified in the form that the simplifier knows.
+NODE* simplified(NODE* t, struct LOOP* loop) {
+    t = simp_tree(denormalize_tree(t, true), loop);
+    return normalize_tree(t, t);
+}
+
 bool is_copy_of_counter(const SYMTAB* sym) { return is_optimizer_temp(sym->name, 'L', 'l'); }
 
 } // namespace
@@ -290,7 +296,7 @@ private:
                 count(reads_itself ? lv->usingDefs : lv->defs);
             }
         } else
-            enter(t->left, bb, t->op == UMULT || (dereferenced && t->op != UMULT));
+            enter(t->left, bb, t->op == UMULT || dereferenced);
         enter(t->right, bb, dereferenced);
     }
 
@@ -348,14 +354,16 @@ bool forward_in_block(BBLK* bb, struct LOOP* loop) {
     for (LIST* s = bb->statements; s; s = s->rest) {
         NODE* t = s->first;
         if (t->op == PPRAGMA) continue;
+        bool changed = false;
         for (const NODE* d : definitions) {
             if (!sym_appears_in_tree(d->left->u.sym, t) || count_nodes_in_tree(t) > MOST_NODES || tree_modifies_lvalue_in_tree(t, d->left) ||
                 tree_modifies_lvalue_in_tree(t, d->right))
                 continue;
             t = subst_tree_for_lvalue_in_tree(d->right, d->left, t);
-            any = true;
+            changed = true;
         }
-        s->first = t = simp_tree(t, loop);
+        s->first = t = changed ? simplified(t, loop) : t;
+        any |= changed;
         definitions.erase(std::remove_if(definitions.begin(), definitions.end(),
                                          [t](const NODE* d) { return tree_modifies_lvalue_in_tree(t, d->left) || tree_modifies_lvalue_in_tree(t, d->right); }),
                           definitions.end());
@@ -395,7 +403,7 @@ void prop_IVs_and_RCs_in_loop(struct LOOP* top, bool recurse) {
             NODE *name = mk_NAME(iv->sym), *value = mk_ICON(truncate_to_type(iv->init->u.lval, iv->sym->type), iv->sym->type->stqs());
             for_each_block(loop, [&](BBLK* bb) {
                 for (LIST* s = bb->statements; s; s = s->rest)
-                    if (s->first->op != PPRAGMA && sym_appears_in_tree(iv->sym, s->first)) s->first = simp_tree(subst_tree_for_lvalue_in_tree(value, name, s->first), loop);
+                    if (s->first->op != PPRAGMA && sym_appears_in_tree(iv->sym, s->first)) s->first = simplified(subst_tree_for_lvalue_in_tree(value, name, s->first), loop);
             });
             erase_tree(name);
             erase_tree(value);

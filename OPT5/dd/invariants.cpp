@@ -123,6 +123,7 @@ private:
 
     void statement(NODE* t) {
         if (t->op == PPRAGMA || t->op == ASM || tree_is_arg_prolog(t)) return;
+        if (t->op == ASG && t->left->op == NAME && enter_address(&t->right)) return;
         visit(&t->left);
         if (t->op != IF && t->op != SWITCH) visit(&t->right);
     }
@@ -134,8 +135,8 @@ private:
         if (enter(place)) return;
         const bool was_certain = is_certain;
         if (t->type->is_pointer() && (t->op == PLUS || t->op == MINUS)) {
-            enter_base(&t->left);
-            enter_base(&t->right);
+            enter_address(&t->left);
+            enter_address(&t->right);
         }
         visit(&t->left);
         is_certain &= t->op != QUEST && t->op != ANDAND && t->op != OROR;
@@ -143,10 +144,10 @@ private:
         is_certain = was_certain;
     }
 
-    // The address of an object that something is added to.
-    void enter_base(NODE** place) {
+    // The address of an object that something is added to, or that a pointer of a loop within starts from.
+    bool enter_address(NODE** place) {
         while ((*place)->op == PCONV) place = &(*place)->left;
-        if ((*place)->op == UAND && stays(*place)) add(place);
+        return (*place)->op == UAND && stays(*place) && add(place);
     }
 
     bool enter(NODE** place) {

@@ -299,7 +299,7 @@ void find_assertions_in_head(struct LOOP* loop) {
 
 // ---- The line of blocks ahead of the loop
 
-constexpr int MOST_STATEMENTS_BACK = 500;
+constexpr int MOST_STATEMENTS_BACK = 500, MOST_TESTS_BACK = 50;
 
 class LINE_AHEAD {
 public:
@@ -327,15 +327,17 @@ private:
         std::vector<LIST**> links;
         for (LIST** link = &bb->statements; *link && (*link)->rest; link = &(*link)->rest) links.push_back(link);
         while (!links.empty()) {
-            if (behind.size() >= MOST_STATEMENTS_BACK) return false;
+            if (--statements_left < 0) return false;
             if (is_pragma(links.back())) {
                 take_run(links);
                 continue;
             }
             const NODE* t = (*links.back())->first;
             links.pop_back();
-            if (const NODE* condition = asserted(t)) assume(copy_tree(condition));
-            behind.push_back(t);
+            if (const NODE* condition = asserted(t))
+                assume(copy_tree(condition));
+            else
+                behind.push_back(t);
         }
         return true;
     }
@@ -396,14 +398,14 @@ private:
         NODE* t = test->branch();
         if (!t || t->op == BRANCH) return;
         guard = nullptr;
-        if (t->op != IF) return;
+        if (tree_acts(t->left)) behind.push_back(t->left);
+        if (t->op != IF || --tests_left < 0) return;
         const BBLK *on_true = t->right->left->lbl->bblock, *on_false = t->right->right->lbl->bblock;
         if (on_true == on_false) return;
         NODE* condition = copy_tree(t->left);
         if (on_true != to) condition = invert_boolean_tree(condition);
         if (!tree_has_side_effects(condition)) condition = simp_for_control(condition, loop->parent);
         assume(condition);
-        behind.push_back(t->left);
         if (to == loop->preheader) guard = t, guard_block = test, guard_chooses = on_true == to;
     }
 
@@ -433,6 +435,7 @@ private:
     static constexpr int MOST_NODES = 32;
     struct LOOP* const loop;
     std::vector<const NODE*> behind; // statements between the place of the walk and the loop, the last first
+    int statements_left = MOST_STATEMENTS_BACK, tests_left = MOST_TESTS_BACK;
     NODE* guard = nullptr; // the first IF behind the place of the walk, if one side of it is the preheader
     BBLK* guard_block = nullptr;
     NODE* kept = nullptr; // an assertion for that block

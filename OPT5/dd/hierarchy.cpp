@@ -65,6 +65,21 @@ std::unique_ptr<LOOPIV> copy_of(const LOOPIV& iv, struct LOOP* loop) {
     return copy;
 }
 
+// Both leave the copies with the loop `to`, whose control variables are among them.
+void copy_LOOPIV_list(const struct LOOP& from, struct LOOP& to) {
+    for (const auto& iv : from.IVs) {
+        to.IVs.push_back(copy_of(*iv, &to));
+        LOOPIV* copy = to.IVs.back().get();
+        to.record_of[copy->sym] = copy;
+        if (iv.get() == from.LCV) to.LCV = copy;
+        if (iv.get() == from.VLCV) to.VLCV = copy;
+    }
+}
+void copy_LOOPLV_list(const struct LOOP& from, struct LOOP& to) {
+    to.LVs = from.LVs;
+    for (LOOPLV& lv : to.LVs) lv.loop = &to;
+}
+
 // The pragma fields that hold one tree.
 constexpr NODE* LOOP::*PRAGMA_FIELDS[] = {
     &LOOP::mustIterate,        &LOOP::probIterate,       &LOOP::unrollPragma,        &LOOP::unrollAmountPragma,
@@ -93,13 +108,8 @@ void copy_facts(const struct LOOP& from, struct LOOP& to) {
     to.RC_syms = from.RC_syms;
     to.ALT_syms = from.ALT_syms;
     to.IV_syms = from.IV_syms;
-    for (const auto& iv : from.IVs) {
-        to.IVs.push_back(copy_of(*iv, &to));
-        if (iv.get() == from.LCV) to.LCV = to.IVs.back().get();
-        if (iv.get() == from.VLCV) to.VLCV = to.IVs.back().get();
-    }
-    to.LVs = from.LVs;
-    for (LOOPLV& lv : to.LVs) lv.loop = &to;
+    copy_LOOPIV_list(from, to);
+    copy_LOOPLV_list(from, to);
     for (auto field : COUNT_FIELDS) to.*field = copied(from.*field);
     for (auto field : PRAGMA_FIELDS) to.*field = copied(from.*field);
     for (auto list : PRAGMA_LISTS) to.*list = copied(from.*list);

@@ -108,6 +108,7 @@ void copy_facts(const struct LOOP& from, struct LOOP& to) {
     to.RC_syms = from.RC_syms;
     to.ALT_syms = from.ALT_syms;
     to.IV_syms = from.IV_syms;
+    to.virtual_symbol = from.virtual_symbol;
     copy_LOOPIV_list(from, to);
     copy_LOOPLV_list(from, to);
     for (auto field : COUNT_FIELDS) to.*field = copied(from.*field);

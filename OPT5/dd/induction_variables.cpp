@@ -520,7 +520,7 @@ NODE* eval_expr_for_2nd_iteration(const NODE* expr, struct LOOP* loop) {
 
 void make_virtual_LCV(struct LOOP* loop) {
     if (!loop->virtual_symbol) {
-        auto sym = std::make_unique<SYMTAB>();
+        auto sym = std::make_shared<SYMTAB>();
         sym->name = safestrdup(("$O$h" + std::to_string(loop->uid)).c_str());
         sym->sclass = SC_AUTO;
         sym->is_temp = true;

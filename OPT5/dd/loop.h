@@ -137,7 +137,7 @@ struct LOOP {
     std::vector<SYMTAB*> IV_syms;
     LOOPIV* LCV = nullptr;  // of `IVs`
     LOOPIV* VLCV = nullptr; // of `IVs`: the count of iterations from 0
-    std::unique_ptr<SYMTAB> virtual_symbol; // its, on no list of the function
+    std::shared_ptr<SYMTAB> virtual_symbol; // its, on no list of the function
     std::vector<std::unique_ptr<LOOPIV>> IVs;
     std::unordered_map<const SYMTAB*, LOOPIV*> record_of; // those of `IVs`; looked up alone
     std::vector<LOOPLV> LVs;

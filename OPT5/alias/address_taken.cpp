@@ -42,11 +42,9 @@ void unmark_globals() {
 // Whether an indirection is the whole object at its address: in normal form that is how memory is named.
 bool is_object_itself(const NODE* t) {
     const NODE* address = t->left;
-    if (trees_are_normalized && address->op == PCONV) address = address->left; // a name of another type than its object
     if (t->right || address->op != UAND || address->left->op != NAME || !address->left->u.sym) return false;
     const TYPE* object = address->left->u.sym->type;
-    if (is_plain_array(object)) return false;
-    return trees_are_normalized ? object->size == t->type->size : compatible_types(object, t->type, true);
+    return !is_plain_array(object) && compatible_types(object, t->type, true);
 }
 
 // `is_access_address`: `t` is the pointer of an access, from which the object can be told. Adds the nodes that write to

@@ -467,6 +467,7 @@ void reinsert(struct LOOP* loop) {
         get_PPRAGMA_tree_int_arg(loop->mustIterate, 0) <= INT65(0))
         set_PPRAGMA_tree_arg(loop->mustIterate, 0, "1");
     LIST** link = &loop->preheader->statements;
+    if (stmt_is_arg_prolog(*link)) link = &(*link)->rest; // which is the first statement of its function
     auto insert = [&](NODE* tree) { link = insert_before(link, tree, (*link)->psn); };
     for (const PLACE_OF_PRAGMA& p : FIELDS)
         if (NODE*& tree = loop->*p.field) {

@@ -175,14 +175,13 @@ bool is_likely_in_register(const SYMTAB* sym) {
            !sym->type->is_volatile();
 }
 
-bool stays_a_name(const NODE* t, const NODE* statement) {
+bool stays_a_name(const NODE* t) {
     const SYMTAB* sym = t->u.sym;
     const bool is_volatile = sym->type->is_volatile() || t->type->is_volatile();
     const bool is_counter = is_optimizer_temp(sym->name, 'i', 'h');
     if (is_counter && !sym->is_aliased() && sym->sclass == SC_AUTO) return true;
     if (sym->sclass != SC_AUTO && is_likely_in_register(sym) && sym->type->is_scalar()) return true;
-    if (!do_dd_for_be && !sym->is_aliased() && sym->level != 0 && !is_aggregate(sym->type) && !is_volatile) return true;
-    return tree_is_arg_prolog(statement);
+    return !do_dd_for_be && !sym->is_aliased() && sym->level != 0 && !is_aggregate(sym->type) && !is_volatile;
 }
 
 // The qualifiers of the symbol; an access that is volatile by itself stays so.
@@ -192,11 +191,11 @@ TYPE* type_by_symbol(TYPE* type, const SYMTAB* sym) {
     return bits == own ? type : tp->mk_qual(type->stqs(), bits);
 }
 
-NODE* normalize_NAME(NODE* t, const NODE* statement) {
+NODE* normalize_NAME(NODE* t, bool in_prolog) {
     SYMTAB* sym = t->u.sym;
     if (!sym || sym->is_function() || (sym->type->is_vector() && !sym->is_aliased())) return t;
     t->type = type_by_symbol(t->type, sym);
-    if (stays_a_name(t, statement)) return t;
+    if (in_prolog || stays_a_name(t)) return t;
     TYPE* type = t->type;
     LS* ls = t->ls;
     t->type = type_by_symbol(sym->type, sym);
@@ -216,21 +215,22 @@ bool is_object_itself(const NODE* t, const NODE* address) {
            (!t->type->is_volatile() || lvalue_is_volatile(name));
 }
 
-NODE* normalize(NODE* t, NODE* statement);
+// `in_prolog`: a part of the argument prolog, which names parameters as they come.
+NODE* normalize(NODE* t, bool in_prolog);
 
-void normalize_operands(NODE* t, NODE* statement) {
-    if (t->right) t->right = normalize(t->right, statement);
-    if (t->left) t->left = normalize(t->left, statement);
+void normalize_operands(NODE* t, bool in_prolog) {
+    if (t->right) t->right = normalize(t->right, in_prolog);
+    if (t->left) t->left = normalize(t->left, in_prolog);
 }
 
-NODE* normalize_UMULT(NODE* t, NODE* statement) {
+NODE* normalize_UMULT(NODE* t, bool in_prolog) {
     if (!t->left->type->is_pointer()) {
-        normalize_operands(t, statement);
+        normalize_operands(t, in_prolog);
         return t;
     }
     if (!t->right && is_object_itself(t, t->left) && !t->left->left->u.sym->type->is_array()) {
         NODE* name = left_alone(left_alone(t));
-        return normalize_NAME(name, statement);
+        return normalize_NAME(name, in_prolog);
     }
     t->left = partition_pointer_under_UMULT(t->left, t);
     OPT_ASSERT(t->left != nullptr);
@@ -239,14 +239,14 @@ NODE* normalize_UMULT(NODE* t, NODE* statement) {
         erase_tree(t->right);
         t->right = nullptr;
     }
-    normalize_operands(t, statement);
+    normalize_operands(t, in_prolog);
     return t;
 }
 
-NODE* normalize(NODE* t, NODE* statement) {
+NODE* normalize(NODE* t, bool in_prolog) {
     switch (t->op) {
-    case NAME: return normalize_NAME(t, statement);
-    case UMULT: return normalize_UMULT(t, statement);
+    case NAME: return normalize_NAME(t, in_prolog);
+    case UMULT: return normalize_UMULT(t, in_prolog);
     case UAND:
         if (without_members(static_cast<const NODE*>(t->left))->op == NAME) return t;
         break;
@@ -255,22 +255,22 @@ NODE* normalize(NODE* t, NODE* statement) {
     case PPRAGMA:
     case ASM: return t;
     case RETURN:
-        if (t->right) t->right = normalize(t->right, statement);
+        if (t->right) t->right = normalize(t->right, in_prolog);
         return t;
-    case SWITCH: t->left = normalize(t->left, statement); return t;
+    case SWITCH: t->left = normalize(t->left, in_prolog); return t;
     case STDOT:
-        t->left = normalize(t->left, statement);
+        t->left = normalize(t->left, in_prolog);
         t->type = merge_qualifiers_for_STDOT(t->type, t);
         return t;
     default: break;
     }
-    normalize_operands(t, statement);
+    normalize_operands(t, in_prolog);
     return t;
 }
 
 } // namespace
 
-NODE* normalize_tree(NODE* t, NODE* statement) { return normalize(t, statement); }
+NODE* normalize_tree(NODE* t, NODE* statement) { return normalize(t, tree_is_arg_prolog(statement)); }
 
 // ---- Back
 
@@ -337,11 +337,17 @@ void settle_alignment_mark(NODE* t) {
 
 NODE* denormalize(NODE* t, bool keep_ddnodes);
 
+thread_local bool made_an_address = false; // which is to be simplified
+
 NODE* denormalize_UMULT(NODE* t, bool keep_ddnodes) {
     t->left = denormalize(t->left, keep_ddnodes);
     if (t->right) {
         t->right = denormalize(t->right, keep_ddnodes);
         join_subscript(t);
+        made_an_address = true;
+    } else if (t->left->op == UAND || t->left->op == PCONV) {
+        if (!t->rare().dd && is_object_itself(t, t->left)) return left_alone(left_alone(t));
+        made_an_address = true;
     }
     settle_alignment_mark(t);
     return with_dependence(t, keep_ddnodes);
@@ -383,8 +389,17 @@ NODE* denormalize_tree(NODE* t, bool keep_ddnodes) { return denormalize(t, keep_
 
 void normalize_all_trees() {
     init_dd_aliasing();
-    rewrite_statements([](NODE* t) { return normalize(t, t); });
+    rewrite_statements([](NODE* t) { return normalize(t, tree_is_arg_prolog(t)); });
     trees_are_normalized = true;
+}
+
+void denormalize_unchanged_trees() {
+    trees_are_normalized = false;
+    rewrite_statements([](NODE* t) {
+        made_an_address = false;
+        t = denormalize(t, false);
+        return made_an_address ? simp_tree(t, nullptr) : t;
+    });
 }
 
 void denormalize_all_trees(bool keep_ddnodes, bool simplify) {

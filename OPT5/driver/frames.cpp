@@ -20,8 +20,6 @@ namespace {
 
 bool has_hierarchy() { return currfuninfo->bb_list && currfuninfo->bb_list->loop; }
 
-void denormalize_and_simplify() { denormalize_all_trees(false, true); }
-
 void begin(bool force) {
     if (!has_hierarchy()) simpcfg(0, 0);
     do_dd_for_be = false;
@@ -31,10 +29,19 @@ void begin(bool force) {
     if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, 1);
 }
 
-void end() {
-    denormalize_and_simplify();
+// Neither the form nor simplifying takes an address of an object.
+void leave() {
     widen_user_variables();
-    changed(fact::graph);
+    changed(fact::graph | fact::alias_marks);
+}
+
+void end() {
+    denormalize_unchanged_trees();
+    leave();
+}
+void end_of_changes() {
+    denormalize_all_trees(false, true);
+    leave();
 }
 
 } // namespace
@@ -65,16 +72,16 @@ const FRAME D_with_dependence = {[] {
                                      wrapup_dependence_analysis(false);
                                      end();
                                  }};
-const FRAME DF = {[] { begin(true); }, end};
+const FRAME DF = {[] { begin(true); }, end_of_changes};
 const FRAME D_where_loops_are = {[] {
                                      if (L2()) begin(false);
                                  },
                                  [] {
                                      if (L2()) end();
                                  }};
-const FRAME N = {normalize_all_trees, denormalize_and_simplify};
+const FRAME N = {normalize_all_trees, denormalize_unchanged_trees};
 const FRAME N_and_no_hierarchy = {normalize_all_trees, [] {
-                                      denormalize_and_simplify();
+                                      denormalize_unchanged_trees();
                                       drop_hierarchy();
                                       simpcfg(0, 0);
                                   }};

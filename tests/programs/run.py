@@ -14,9 +14,10 @@ A program may begin with comments that say how it is built:
   // optimize: WORD...   every level is taken with these words too; such a line may be repeated
 
 With --forms SEED each program is judged once a level as another parser might have written it (forms.py), with the trees
-brought into the form of loop work and back at each step that will have work there.
+brought into the form of loop work and back at each step that will have work there, and in two other orders of the steps.
 """
 import argparse
+import random
 import sys
 import tempfile
 import zlib
@@ -106,6 +107,13 @@ def parsed(tools, source, folder, words=()):
     return unit, tools.execute(unit)
 
 
+def orders(name):
+    """Orders of the steps: loop work ahead of inlining; the table up to some step; loop work, or all steps, in any order."""
+    rng, steps, loop_work = random.Random(name), list(range(81)), range(28, 61)
+    chosen = rng.choice((steps[:rng.choice(loop_work)], steps[:28] + rng.sample(loop_work, 33) + steps[61:], rng.sample(steps, 81)))
+    return [",".join(map(str, order)) for order in ([41, 13, 6, 11], chosen)]
+
+
 def judge_program(tools, source, expected, levels, folder, forms=None):
     """All failures of one program, each a line of text; none when it passes."""
     try:
@@ -119,6 +127,10 @@ def judge_program(tools, source, expected, levels, folder, forms=None):
     if forms is not None:
         for level in levels:
             failures += judge_variant(tools, unit, want, f"level {level}", [f"--opt_level={level}", CHECK, FRAMES], [""])
+        if "3" in levels:
+            for number, order in enumerate(orders(f"{forms} {source.stem}")):
+                words = ["--opt_level=3", f"--opt_passes={order}", CHECK, FRAMES]
+                failures += judge_variant(tools, unit, want, f"order {number}", words, [""])
         return failures
     for name, words in variants(levels, directives(source, "optimize")):
         failures += judge_variant(tools, unit, want, name, words)

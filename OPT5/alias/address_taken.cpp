@@ -84,7 +84,8 @@ void mark_addressed(const NODE* t, bool is_access_address, int& writes) {
                 return;
             }
             // The address of what a pointer points to is that pointer.
-            if (object->op == UMULT && !object->right) {
+            if (object->op == UMULT) {
+                mark_addressed(object->right, false, writes);
                 is_access_address &= t->op == UAND && object->left->type->is_pointer();
                 t = object->left;
                 continue;

@@ -124,7 +124,11 @@ SPMAP::SPINFO SPMAP::pointee_of(const NODE* p) const {
             int64_t bits = 0;
             const NODE* object = without_members(static_cast<const NODE*>(p->left), &bits);
             offset = offset + INT65(bits >> 4);
-            if (object->op == UMULT && !object->right) { // the address of what a pointer points to
+            if (object->op == UMULT) { // the address of what a pointer points to
+                if (object->right && object->right->op == ICON)
+                    offset = offset + object->right->u.lval;
+                else
+                    precise &= !object->right;
                 p = object->left;
                 continue;
             }

@@ -439,7 +439,7 @@ SYMTAB* object_name_if_known(const NODE* t) {
     while (t && (is_transparent(t->op) || is_part(t->op) || (t->op >= SSA_USE && t->op <= SSA_CHI))) t = t->left;
     if (!t) return nullptr;
     if (t->op == NAME) return t->u.sym;
-    return t->op == STREF || (t->op == UMULT && !t->right) ? pointee_name_if_known(t->left) : nullptr;
+    return t->op == STREF || t->op == UMULT ? pointee_name_if_known(t->left) : nullptr;
 }
 
 // ---- Substitution

@@ -1,5 +1,5 @@
 // Accesses that loop work brings into base and subscript and back: the same accesses, each as volatile as it was.
-// RUN: --opt_level=2 --disable_inlining --debug:idle_frames
+// RUN: --opt_level=2 --disable_inlining --debug:idle_frames,validate
 #include <zrun.h>
 
 unsigned near_start[] = {5, 6, 7, 8};
@@ -7,6 +7,7 @@ int big[9], *q, g;
 long wide[6];
 volatile int port;
 struct S { int a[4]; volatile int flag; long last; } gs, *sp = &gs;
+static struct S sa[3];
 
 void look(int *p) { *p += 1; }
 
@@ -54,6 +55,16 @@ int through_pointers(int k) {
     return sum;
 }
 
+int address_of_element(int k) {
+    int *p = &sa[1].a[2], n, r = 0;
+    for (n = 0; n < 3; n++) {
+        *p = n + k;
+        sa[n].a[2] = 5;
+        r = r * 10 + *p;
+    }
+    return r;
+}
+
 unsigned near_limit(unsigned *p, int i, unsigned u, long l) { return *(p + i + 32767 - 32767) * 10u + *(p + l - u + i); }
 
 int main(void) {
@@ -67,6 +78,7 @@ int main(void) {
     put_i16(reads_twice(&port));
     put_i16(qualified(3, 4));
     put_i16(through_pointers(2));
+    put_i16(address_of_element(1));
     put_u32(near_limit(near_start + 1, 1, 2u, 1L));
     return 0;
 }

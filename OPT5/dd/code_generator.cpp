@@ -36,15 +36,18 @@ void print_scopes() {
         debug_printf("<<NULL SCOPE>>\n");
 }
 
-// Conditions that the program asserts have served.
-void delete_NASSERTs() {
+// Conditions that the program asserts have served. Whether there were any.
+bool delete_NASSERTs() {
+    bool any = false;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LIST** link = &bb->statements; *link;)
-            if ((*link)->first->op == NASSERT && *link != bb->last_statement())
+            if ((*link)->first->op == NASSERT && *link != bb->last_statement()) {
                 drop_statement(link);
-            else
+                any = true;
+            } else
                 link = &(*link)->rest;
     currfuninfo->has_nasserts = false;
+    return any;
 }
 
 // Copies of memory have no destinations to be wrapped on this target; pairs of clones that lost one, banks of memory, and
@@ -74,9 +77,10 @@ void find_records(struct LOOP* root) {
     wrapup_dependence_analysis(true);
 }
 
+// Nothing is delayed: a hierarchy has blocks on edges that are none of the layout.
 void remove_dead_assignments() {
     need(fact::live_variables);
-    elim_dead_assigns(false, false);
+    elim_dead_assigns(true, false);
 }
 
 } // namespace
@@ -90,10 +94,7 @@ void do_dd_analysis_for_be() {
     normalize_all_trees();
     rebuildcfg();
     build_loop_hierarchy(false, false, false, 0);
-    if (currfuninfo->has_nasserts) {
-        delete_NASSERTs();
-        remove_dead_assignments();
-    }
+    if (currfuninfo->has_nasserts && delete_NASSERTs()) remove_dead_assignments();
     elim_dd_dead_assignments = false;
     struct LOOP* root = loop_root();
     if (root) find_records(root);

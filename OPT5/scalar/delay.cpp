@@ -86,6 +86,8 @@ private:
             target = e->first;
         }
         if (!target) return nullptr;
+        // A test that closes a loop stays the end of the iteration: what is promised of their count is of that.
+        if (target->predecessors->rest && target->dfn <= bb->dfn) return nullptr;
         // A new block for a mere copy costs more than it saves.
         if (target->predecessors->rest && !t->right->left) return nullptr;
         for (const NODE* p : passed)

@@ -86,6 +86,20 @@ long never_run(int n) {
     return s;
 }
 
+// What the next iteration alone reads is computed ahead of the test all the same: the test stays the end of an iteration.
+// FUNCTION: read_by_the_next
+// HAS: /MUST_ITERATE\("5", "5"/
+// COUNT 1: goto
+int read_by_the_next(int n) {
+    int *p = g, s = 0, y = n + 1;
+    do {
+        s += y;
+        p++;
+        y = g[n & 7] + s;
+    } while (p < g + 5);
+    return s;
+}
+
 int main(void) {
     for (int i = 0; i < 8; i++) g[i] = i * i;
     put_i32(two_loops(8));
@@ -95,5 +109,6 @@ int main(void) {
     only_a_test();
     put_i16(g[3]);
     put_i32(left_at_once(5, 0) + left_at_once(4, 1) + never_run(3));
+    put_i16(read_by_the_next(3));
     return 0;
 }

@@ -157,7 +157,7 @@ def judge(tools, source, folder):
         case = read_case(source.read_text())
         tools.parse(source, unit)
         tools.optimize(unit, out, [*case.words, "--debug:validate"])
-        before, after = tools.execute(unit), tools.execute(out)
+        before, after = tools.execute(unit), tools.execute(out, ["--check"])
         failures = check_dump(tools.dump(out), case)
         if before.status != 0:
             failures.append(f"unoptimized: status {before.status}: {before.errors.strip()}")

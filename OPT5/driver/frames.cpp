@@ -15,36 +15,49 @@
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 
+#include <algorithm>
+
 namespace {
 
 
 bool has_hierarchy() { return currfuninfo->bb_list && currfuninfo->bb_list->loop; }
 
-void begin(bool force) {
-    if (!has_hierarchy()) simpcfg(0, 0);
-    do_dd_for_be = false;
-    widen_user_variables();
-    split_qualified_parameter_copies();
+// What is still to be done behind the last row: rows with a frame follow each other, and the form that one leaves the next
+// begins with.
+enum KEPT : uint8_t { NOTHING, FORM, CHANGED_FORM } kept = NOTHING;
+
+void enter_form() {
+    if (kept != NOTHING) return;
     normalize_all_trees();
+}
+
+void begin(bool force) {
+    if (kept == NOTHING) {
+        if (!has_hierarchy()) simpcfg(0, 0);
+        do_dd_for_be = false;
+        widen_user_variables();
+        split_qualified_parameter_copies();
+    }
+    enter_form();
     if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, 1);
 }
 
 // Neither the form nor simplifying takes an address of an object.
-void leave() {
+void end() { kept = std::max(kept, FORM); }
+void end_of_changes() { kept = CHANGED_FORM; }
+
+} // namespace
+
+void leave_kept_form() {
+    if (kept == NOTHING) return;
+    if (kept == CHANGED_FORM)
+        denormalize_all_trees(false, true);
+    else
+        denormalize_unchanged_trees();
+    kept = NOTHING;
     widen_user_variables();
     changed(fact::graph | fact::alias_marks);
 }
-
-void end() {
-    denormalize_unchanged_trees();
-    leave();
-}
-void end_of_changes() {
-    denormalize_all_trees(false, true);
-    leave();
-}
-
-} // namespace
 
 bool has_loops() {
     if (has_hierarchy()) return true;
@@ -74,14 +87,18 @@ const FRAME D_with_dependence = {[] {
                                  }};
 const FRAME DF = {[] { begin(true); }, end_of_changes};
 const FRAME D_where_loops_are = {[] {
-                                     if (L2()) begin(false);
+                                     if (L2() && has_loops()) begin(false);
                                  },
                                  [] {
-                                     if (L2()) end();
+                                     if (trees_are_normalized) end();
                                  }};
-const FRAME N = {normalize_all_trees, denormalize_unchanged_trees};
-const FRAME N_and_no_hierarchy = {normalize_all_trees, [] {
-                                      denormalize_unchanged_trees();
+const FRAME N = {enter_form, end};
+const FRAME N_and_no_hierarchy = {[] {
+                                      if (has_hierarchy()) enter_form();
+                                  },
+                                  [] {
+                                      if (trees_are_normalized) end();
+                                      leave_kept_form();
                                       drop_hierarchy();
                                       simpcfg(0, 0);
                                   }};

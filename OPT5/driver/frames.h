@@ -9,12 +9,16 @@ extern const FRAME D;
 extern const FRAME D_with_dependence;
 // D with the full hierarchy built anew, whether there is one or not.
 extern const FRAME DF;
-// D from level 2 on, and nothing below.
+// D from level 2 on in functions with loops, nothing otherwise.
 extern const FRAME D_where_loops_are;
 // Normal form alone.
 extern const FRAME N;
 // The same; behind it the hierarchy goes and the blocks are simplified.
 extern const FRAME N_and_no_hierarchy;
+
+// The form that the last row with a frame left for the next is undone: ahead of rows without one, and where the work on a
+// function stops.
+void leave_kept_form();
 
 bool has_loops(); // of the current function: a hierarchy, or edges that lead back
 // Pragmas go back to the statements, and the blocks are simplified, since no hierarchy is needed any more.

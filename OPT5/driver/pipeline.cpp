@@ -1,6 +1,7 @@
 #include "OPT5/driver/pipeline.h"
 
 #include "OPT5/driver/driver.h"
+#include "OPT5/driver/frames.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
@@ -45,6 +46,7 @@ bool has_work(const ROW& row) {
 
 void do_work(const ROW& row, const std::string& label) {
     if (!has_work(row)) return;
+    if (!row.frame || pass_debug_idle_frames) leave_kept_form();
     if (row.frame) {
         row.frame->begin();
         if (pass_debug_validate) validate_current_function(row, label + " at the begin of");

@@ -7,6 +7,7 @@
 #include "BANNER/banner.h"
 #include "DECODE/decode.h"
 #include "OPT5/driver/driver.h"
+#include "OPT5/driver/frames.h"
 #include "OPT5/driver/passes.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -80,6 +81,7 @@ void run_until_barrier(SYMTAB* sym, PASS_LIST& passes) {
         passes.front()->run();
         passes.pop_front();
     }
+    if (currfuninfo) leave_kept_form();
     OPT_ASSERT(passes.empty() || passes.front()->is_barrier());
 }
 

@@ -233,7 +233,7 @@ const ROW steps[] = {
     /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
     /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
-    /* 28 */ {F, "forward_substitution", &DF, L2, nothing, none, graph | alias_marks},
+    /* 28 */ {F, "forward_substitution", &DF, L2_with_loops, nothing, none, graph | alias_marks},
     /* 29 */ {L, "SSA_hoist", &D, L2, [] { in_SSA_form<true>(hoist_SSA_region_constants); }, none, none},
     /* 30 */ {L, "SSA_NASSERTs", &N, L2, [] { in_SSA_form<false>(clone_SSA_NASSERTs); }, none, none},
     /* 31 */ {L, "SSA_propagate", &D, L2, [] { in_SSA_form<false>([] { propagate_SSA_constants(3); }); }, none, none},

@@ -3,15 +3,16 @@
 // They come from assertions in the head, and from assertions and tests on the straight line of blocks that leads to the
 // preheader; pragmas that stand there go to the record of the loop on the same walk.
 //
-// Needs: invariants of the loops; of those that are induction variables, their directions. Leaves: the same; pragmas are
-// taken out of the statements.
-// Sound because a fact of values on entry reads invariants of the loop alone, and nothing between it and the loop may change
-// what it reads. An assertion in the head counts only where no call stands ahead of it: the call may not return, and then
-// the assertion says nothing of what was done before. One on a variable that only grows, as v >= 3, also holds in the
-// iterations that follow. Facts die with the hierarchy, for a later pass may give a variable another meaning.
+// Needs: invariants of the loops; of those that are induction variables, their directions. Leaves: the same; pragmas
+// are taken out of the statements. Sound because a fact of values on entry reads invariants of the loop alone, and
+// nothing between it and the loop may change what it reads. An assertion in the head counts only where no call stands
+// ahead of it: the call may not return, and then the assertion says nothing of what was done before. One on a variable
+// that only grows, as v >= 3, also holds in the iterations that follow. Facts die with the hierarchy, for a later pass
+// may give a variable another meaning.
 
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
+#include "OPT5/dd/trip.h"
 
 #include "IFILE/pragma.h"
 #include "OPT5/alias/effects.h"
@@ -28,7 +29,9 @@
 
 namespace {
 
-struct LOOP* parent_of(const struct LOOP* loop) { return loop->parent; }
+struct LOOP* parent_of(const struct LOOP* loop) {
+    return loop->parent;
+}
 const std::vector<NODE*>& givens_of(const struct LOOP* loop) { return loop->givens; }
 void add_given(struct LOOP* loop, NODE* condition) { loop->givens.push_back(condition); }
 bool is_constant_in(const NODE* tree, const struct LOOP* loop) {
@@ -72,7 +75,8 @@ NODE* reduced_boolean(NODE* t) {
 }
 
 NODE* with_constant_on_the_right(NODE* t) {
-    if (!op_is_int_compare(t->op) || t->left->op != ICON || t->right->op == ICON || commute_inv[t->op] == ILLOP) return t;
+    if (!op_is_int_compare(t->op) || t->left->op != ICON || t->right->op == ICON || commute_inv[t->op] == ILLOP)
+        return t;
     t->op = static_cast<decltype(t->op)>(commute_inv[t->op]);
     std::swap(t->left, t->right);
     return t;
@@ -92,7 +96,8 @@ NODE* mask_as_remainder(NODE* t) {
 
 // (x >> k) < c as x < c << k, (x >> k) <= c as x < (c + 1) << k, and their opposites: a shift rounds down.
 NODE* without_shift(NODE* t) {
-    if (!op_is_int_compare(t->op) || t->op == EQ || t->op == NEQ || t->left->op != SRL || t->right->op != ICON) return t;
+    if (!op_is_int_compare(t->op) || t->op == EQ || t->op == NEQ || t->left->op != SRL || t->right->op != ICON)
+        return t;
     NODE* shift = t->left;
     TYPE* type = shift->type->stqs();
     const bool compares_values = (t->op >= ULE) == type->is_unsigned();
@@ -231,7 +236,8 @@ void add_fact(NODE* fact, struct LOOP* loop) {
             loop->givens.erase(loop->givens.begin() + static_cast<std::ptrdiff_t>(i));
         } else
             ++i;
-    if (print_debug) debug_printf("Adding invariant assertion to loop #%d: %s\n", loop->uid, tree_to_infix(fact).c_str());
+    if (print_debug)
+        debug_printf("Adding invariant assertion to loop #%d: %s\n", loop->uid, tree_to_infix(fact).c_str());
     loop->givens.push_back(fact);
 }
 
@@ -256,12 +262,6 @@ void add_loop_entry_assertion(NODE* tree, struct LOOP* loop) {
 
 namespace {
 
-// The condition of an assertion, or null for another statement.
-const NODE* asserted(const NODE* t) {
-    if (t->op != NASSERT && t->op != ASSERT) return nullptr;
-    return t->left->op == COMMA ? t->left->left : t->left;
-}
-
 // v >= rc of a variable that only grows, v <= rc of one that only shrinks.
 bool stays_true(const NODE* t, struct LOOP* loop) {
     if (!op_is_int_compare(t->op)) return false;
@@ -277,13 +277,14 @@ bool stays_true(const NODE* t, struct LOOP* loop) {
 }
 
 bool may_not_return(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) { return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM; });
+    return any_subtree(
+        t, [](const NODE* n) { return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM; });
 }
 
 void find_assertions_in_head(struct LOOP* loop) {
     for (const LIST* s = loop->head->statements; s && s->rest && !may_not_return(s->first); s = s->rest) {
-        const NODE* condition = asserted(s->first);
-        if (!condition || tree_has_side_effects(condition)) continue;
+        const NODE* condition = asserted_condition(s->first);
+        if (!condition) continue;
         const bool always = is_ANTIALIASED_ICALL(condition) || expr_is_constant(condition) ||
                             tree_is_RC_in_loop(condition, loop, false);
         if (!always) {
@@ -334,7 +335,7 @@ private:
             }
             const NODE* t = (*links.back())->first;
             links.pop_back();
-            if (const NODE* condition = asserted(t))
+            if (const NODE* condition = asserted_condition(t))
                 assume(copy_tree(condition));
             else
                 behind.push_back(t);
@@ -345,8 +346,8 @@ private:
     static bool is_pragma(LIST** link) { return (*link)->first->op == PPRAGMA; }
     static bool is_mark(LIST** link) { return (*link)->first->pragma->kind == PRG_SRC_LOOP; }
 
-    // Pragmas that follow each other. The mark of the loop's place in the source stands with its pragmas: what is ahead of
-    // another mark, or of the run that the mark stands in, was said of a loop that is gone.
+    // Pragmas that follow each other. The mark of the loop's place in the source stands with its pragmas: what is ahead
+    // of another mark, or of the run that the mark stands in, was said of a loop that is gone.
     void take_run(std::vector<LIST**>& links) {
         size_t first = links.size(), marks = 0;
         for (; first > 0 && is_pragma(links[first - 1]); --first) marks += is_mark(links[first - 1]);
@@ -376,7 +377,8 @@ private:
     // The tree is consumed.
     void assume(NODE* condition) {
         bool holds = !tree_has_side_effects(condition);
-        for (size_t i = behind.size(); i > 0 && holds; --i) holds = !tree_modifies_lvalue_in_tree(behind[i - 1], condition);
+        for (size_t i = behind.size(); i > 0 && holds; --i)
+            holds = !tree_modifies_lvalue_in_tree(behind[i - 1], condition);
         if (holds && !tree_is_RC_in_loop(condition, loop, false)) condition = of_entry(condition);
         add_loop_entry_assertion(condition, holds ? loop : nullptr);
     }
@@ -384,9 +386,11 @@ private:
     // With the values on entry of the loop's variables, which they have at the condition too.
     NODE* of_entry(NODE* condition) {
         for (const auto& iv : loop->IVs) {
-            if (!iv->has(IV_is_IV) || iv->has(IV_is_VLCV) || !iv->init || !iv->init->type->is_int() || !iv->sym->type->is_int() || !sym_appears_in_tree(iv->sym, condition))
+            if (!iv->has(IV_is_IV) || iv->has(IV_is_VLCV) || !iv->init || !iv->init->type->is_int() ||
+                !iv->sym->type->is_int() || !sym_appears_in_tree(iv->sym, condition))
                 continue;
-            NODE *name = mk_NAME(iv->sym), *value = coerce_to_type(iv->sym->type->stqs(), denormalize_tree(copy_tree(iv->init), false));
+            NODE *name = mk_NAME(iv->sym),
+                 *value = coerce_to_type(iv->sym->type->stqs(), denormalize_tree(copy_tree(iv->init), false));
             condition = subst_tree_for_lvalue_in_tree(value, name, condition);
             erase_tree(name);
             erase_tree(value);

@@ -1,14 +1,14 @@
 // Bounds of the variables of a loop: between which numbers a variable stays at every point of the loop, from its first
 // value to the one with which the loop is left.
 //
-// They come from the ends of the control variable and from accesses of arrays: where one is made in every iteration, its
-// subscript lies in the array, and so the loop has no more iterations than the array has places.
+// They come from the ends of the control variable and from accesses of arrays: where one is made in every iteration,
+// its subscript lies in the array, and so the loop has no more iterations than the array has places.
 //
 // Needs: affine variables and trip counts; trees in normal form. Leaves: the same, with narrower bounds and maxima.
-// Sound because an access is taken for one of every iteration only if its block is passed between the head and each of the
-// tail and the exits, and nothing in the loop may fail to come back: of `if (i == 10) done(); a[i] = 1;` a call that ends
-// the program is no edge. The access lies in the whole object, not in the row that it is written with: m[0][i] may run
-// through all rows. What holds at the access is widened by a step for the places behind the update.
+// Sound because an access is taken for one of every iteration only if its block is passed between the head and each of
+// the tail and the exits, and nothing in the loop may fail to come back: of `if (i == 10) done(); a[i] = 1;` a call
+// that ends the program is no edge. The access lies in the whole object, not in the row that it is written with:
+// m[0][i] may run through all rows. What holds at the access is widened by a step for the places behind the update.
 
 #include "OPT5/dd/trip.h"
 
@@ -28,29 +28,30 @@ constexpr int64_t MOST_STEP = 50000;
 bool is_icon(const NODE* t) { return t && t->op == ICON; }
 
 // The step of an affine variable of integers, or nothing.
-std::optional<WIDE_INT> constant_step(const LOOPIV* iv) {
+std::optional<WIDE> constant_step(const LOOPIV* iv) {
     if (!iv->has(IV_affine) || !is_icon(iv->incrtree) || !iv->sym->type->is_int()) return std::nullopt;
     const INT65 step = sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type);
     if (step.is_zero()) return std::nullopt;
-    return wide_of(step);
+    return to_wide(step);
 }
 
 // Each iteration starts with another value.
-void bound_trips(const LOOPIV* iv, WIDE_INT low, WIDE_INT high) {
+void bound_trips(const LOOPIV* iv, WIDE low, WIDE high) {
     struct LOOP* loop = iv->loop;
     const auto step = constant_step(iv);
-    if (!step || *step > MOST_STEP || *step < -MOST_STEP || is_icon(loop->trips) || !is_icon(loop->minTrips) || !is_icon(loop->maxTrips) || high < low)
+    if (!step || *step > MOST_STEP || *step < -MOST_STEP || is_icon(loop->trips) || !is_icon(loop->minTrips) ||
+        !is_icon(loop->maxTrips) || high < low)
         return;
-    const WIDE_INT trips = (high - low) / (*step < 0 ? -*step : *step) + 1;
-    if (trips < wide_of(loop->minTrips->u.lval) || trips < 1 || trips >= wide_of(loop->maxTrips->u.lval)) return;
-    if (loop->trips && int65_of(trips) > int_type_max(loop->trips->type->stqs())) return;
-    loop->maxTrips->u.lval = int65_of(trips);
-    if (loop->VLCV) loop->VLCV->highval = int65_of(loop->is_bottom_tested() ? trips - 1 : trips);
+    const WIDE trips = (high - low) / (*step < 0 ? -*step : *step) + 1;
+    if (trips < to_wide(loop->minTrips->u.lval) || trips < 1 || trips >= to_wide(loop->maxTrips->u.lval)) return;
+    if (loop->trips && to_int65(trips) > int_type_max(loop->trips->type->stqs())) return;
+    loop->maxTrips->u.lval = to_int65(trips);
+    if (loop->VLCV) loop->VLCV->highval = to_int65(loop->is_bottom_tested() ? trips - 1 : trips);
     reconcile_MUST_ITERATE_pragma(loop);
 }
 
 void after_change(const LOOPIV* iv) {
-    if (iv == iv->loop->LCV) bound_trips(iv, wide_of(iv->lowval), wide_of(iv->highval));
+    if (iv == iv->loop->LCV) bound_trips(iv, to_wide(iv->lowval), to_wide(iv->highval));
 }
 
 bool takes_bounds(const LOOPIV* iv) { return iv->sym->type->is_int() || iv->sym->type->is_enum(); }
@@ -73,34 +74,30 @@ void constrain_LOOPIV_lowval(LOOPIV* iv, INT65 value) {
 
 namespace {
 
-struct RANGE_OF_VALUES {
-    WIDE_INT low, high;
-};
-
-void constrain(LOOPIV* iv, const RANGE_OF_VALUES& r, uint64_t exact) {
-    if (r.low > r.high) return;
-    const INT65 low = int65_of(r.low), high = int65_of(r.high);
+void constrain(LOOPIV* iv, const RANGE& r, uint64_t exact) {
+    if (r.min > r.max) return;
+    const INT65 low = to_int65(r.min), high = to_int65(r.max);
     constrain_LOOPIV_lowval(iv, low);
     constrain_LOOPIV_highval(iv, high);
     if (iv->lowval == low) iv->flags |= exact & IV_low_is_exact;
     if (iv->highval == high) iv->flags |= exact & IV_high_is_exact;
 }
 
-bool is_within(const RANGE_OF_VALUES& r, TYPE* type) {
-    return r.low >= wide_of(int_type_min(type)) && r.high <= wide_of(int_type_max(type));
+bool is_within(const RANGE& r, TYPE* type) {
+    return r.min >= to_wide(int_type_min(type)) && r.max <= to_wide(int_type_max(type));
 }
 
 // The values of a tree that is read ahead of the loop.
-std::optional<RANGE_OF_VALUES> values_ahead(const NODE* t, const struct LOOP* loop, TYPE* type) {
-    INT65 min, max;
-    if (!t || !t->type->is_int() || !calculate_bounds(t, loop->parent, &min, &max)) return std::nullopt;
-    const RANGE_OF_VALUES r{wide_of(min), wide_of(max)};
-    if (t->op == ICON) return RANGE_OF_VALUES{wide_of(truncate_to_type(t->u.lval, type)), wide_of(truncate_to_type(t->u.lval, type))};
-    return is_within(r, type) ? r : std::optional<RANGE_OF_VALUES>();
+std::optional<RANGE> values_ahead(const NODE* t, const struct LOOP* loop, TYPE* type) {
+    RANGE r{0, 0};
+    if (!t || !bounds_of(t, loop->parent, &r)) return std::nullopt;
+    if (t->op == ICON)
+        return RANGE{to_wide(truncate_to_type(t->u.lval, type)), to_wide(truncate_to_type(t->u.lval, type))};
+    return is_within(r, type) ? r : std::optional<RANGE>();
 }
 
 // How far behind the limit the test may leave it.
-WIDE_INT overshoot(int op, WIDE_INT size) {
+WIDE overshoot(int op, WIDE size) {
     if (op == NEQ) return 0;
     return op == LT || op == ULT || op == GT || op == UGT ? size - 1 : size;
 }
@@ -116,20 +113,21 @@ void refine_loop_highlow(struct LOOP* loop) {
     const bool up = *step > 0;
     const auto start = values_ahead(iv->init, loop, type), limit = values_ahead(iv->last, loop, type);
     if (start) {
-        RANGE_OF_VALUES r{wide_of(int_type_min(type)), wide_of(int_type_max(type))};
-        (up ? r.low : r.high) = up ? start->low : start->high;
+        RANGE r{to_wide(int_type_min(type)), to_wide(int_type_max(type))};
+        (up ? r.min : r.max) = up ? start->min : start->max;
         const bool is_constant = iv->init->op == ICON;
         if (is_constant && is_icon(loop->maxTrips) && loop->maxTrips->u.lval < no_trip_bound()) {
-            const WIDE_INT far = start->low + *step * wide_of(loop->maxTrips->u.lval);
-            if (up ? far <= r.high : far >= r.low) (up ? r.high : r.low) = far;
+            const WIDE far = start->min + *step * to_wide(loop->maxTrips->u.lval);
+            if (up ? far <= r.max : far >= r.min) (up ? r.max : r.min) = far;
         }
-        const uint64_t near_end = up ? IV_low_is_exact : IV_high_is_exact, far_end = up ? IV_high_is_exact : IV_low_is_exact;
+        const uint64_t near_end = up ? IV_low_is_exact : IV_high_is_exact,
+                       far_end = up ? IV_high_is_exact : IV_low_is_exact;
         constrain(iv, r, is_constant ? near_end | (is_icon(loop->trips) ? far_end : 0) : 0);
     }
     if (limit && first_test_holds(loop) && loop->test != EQ) {
-        const WIDE_INT more = overshoot(loop->test, up ? *step : -*step);
-        RANGE_OF_VALUES r{wide_of(int_type_min(type)), wide_of(int_type_max(type))};
-        (up ? r.high : r.low) = up ? std::min(r.high, limit->high + more) : std::max(r.low, limit->low - more);
+        const WIDE more = overshoot(loop->test, up ? *step : -*step);
+        RANGE r{to_wide(int_type_min(type)), to_wide(int_type_max(type))};
+        (up ? r.max : r.min) = up ? std::min(r.max, limit->max + more) : std::max(r.min, limit->min - more);
         constrain(iv, r, 0);
     }
 }
@@ -139,7 +137,9 @@ void refine_loop_highlow(struct LOOP* loop) {
 namespace {
 
 bool may_not_come_back(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) { return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM || n->op == ASSERT; });
+    return any_subtree(t, [](const NODE* n) {
+        return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM || n->op == ASSERT;
+    });
 }
 
 // Innermost loops alone: one in it may never end.
@@ -188,7 +188,8 @@ private:
 
     void use(const NODE* access) {
         LINEAR_FORM sum(64);
-        if (access->type->is_func() || access->type->is_array() || access->type->size == 0 || access->type->size % UNIT || !read_exact_sum(access->left, 1, &sum) ||
+        if (access->type->is_func() || access->type->is_array() || access->type->size == 0 ||
+            access->type->size % UNIT || !read_exact_sum(access->left, 1, &sum) ||
             (access->right && !read_exact_sum(access->right, 1, &sum)))
             return;
         const SYMTAB* object = nullptr;
@@ -203,31 +204,35 @@ private:
             else
                 return;
         }
-        if (object && iv && by && (object->type->is_array() || object->type->is_struct()) && object->type->size > access->type->size)
+        if (object && iv && by && (object->type->is_array() || object->type->is_struct()) &&
+            object->type->size > access->type->size)
             constrain_by(iv, static_cast<int64_t>((object->type->size - access->type->size) / UNIT), sum.constant, by);
     }
 
     // 0 <= constant + by * v <= most
-    void constrain_by(LOOPIV* iv, WIDE_INT most, WIDE_INT constant, WIDE_INT by) {
+    void constrain_by(LOOPIV* iv, WIDE most, WIDE constant, WIDE by) {
         const auto step = constant_step(iv);
         if (!step || *step > MOST_STEP || *step < -MOST_STEP) return;
-        auto floor_of = [](WIDE_INT a, WIDE_INT b) { return a / b - (a % b != 0 && (a < 0) != (b < 0) ? 1 : 0); };
-        RANGE_OF_VALUES r{-floor_of(constant, by), floor_of(most - constant, by)};
+        auto floor_of = [](WIDE a, WIDE b) { return a / b - (a % b != 0 && (a < 0) != (b < 0) ? 1 : 0); };
+        RANGE r{-floor_of(constant, by), floor_of(most - constant, by)};
         if (by < 0) r = {-floor_of(-(most - constant), by), floor_of(-constant, by)};
         TYPE* type = iv->sym->type->stqs();
-        if (r.low > r.high || type->is_bool()) return;
-        r.low = std::max(r.low, wide_of(iv->lowval));
-        r.high = std::min(r.high, wide_of(iv->highval));
-        bound_trips(iv, r.low, r.high);
-        const WIDE_INT size = *step < 0 ? -*step : *step;
-        const RANGE_OF_VALUES everywhere{std::max(r.low - size, wide_of(iv->lowval)), std::min(r.high + size, wide_of(iv->highval))};
-        if (!is_within(everywhere, type) || everywhere.low > everywhere.high) return;
-        const bool lower = everywhere.low > wide_of(iv->lowval), upper = everywhere.high < wide_of(iv->highval);
+        if (r.min > r.max || type->is_bool()) return;
+        r.min = std::max(r.min, to_wide(iv->lowval));
+        r.max = std::min(r.max, to_wide(iv->highval));
+        bound_trips(iv, r.min, r.max);
+        const WIDE size = *step < 0 ? -*step : *step;
+        const RANGE everywhere{std::max(r.min - size, to_wide(iv->lowval)),
+                               std::min(r.max + size, to_wide(iv->highval))};
+        if (!is_within(everywhere, type) || everywhere.min > everywhere.max) return;
+        const bool lower = everywhere.min > to_wide(iv->lowval), upper = everywhere.max < to_wide(iv->highval);
         constrain(iv, everywhere, 0);
         const bool is_unsigned = type->is_unsigned();
-        auto assert_bound = [&](int op, WIDE_INT v) { add_loop_body_assertion(maketree(op, mk_NAME(iv->sym), mk_ICON(int65_of(v), type), tp->int_t), loop); };
-        if (upper) assert_bound(is_unsigned ? ULE : LE, everywhere.high);
-        if (lower) assert_bound(is_unsigned ? UGE : GE, everywhere.low);
+        auto assert_bound = [&](int op, WIDE v) {
+            add_loop_body_assertion(maketree(op, mk_NAME(iv->sym), mk_ICON(to_int65(v), type), tp->int_t), loop);
+        };
+        if (upper) assert_bound(is_unsigned ? ULE : LE, everywhere.max);
+        if (lower) assert_bound(is_unsigned ? UGE : GE, everywhere.min);
     }
 
     struct LOOP* const loop;

@@ -4,10 +4,10 @@
 // preheader again. MUST_ITERATE is kept in step with what is known of the trip count, in both directions.
 //
 // Needs: trees of the hierarchy; `minTrips`, `maxTrips` and `tripFactor` for the promises. Leaves: the same.
-// Sound because a promise is never made of what is not proved: of a loop that may be left early the minimum and the factor
-// are not written, for they are those of the formula; a promise that contradicts itself or what is known is dropped. A
-// minimum of 0 is no reason to expect an iteration, however large the multiple is: MUST_ITERATE(0,100,2) of a loop over
-// n == 0 elements runs none.
+// Sound because a promise is never made of what is not proved: of a loop that may be left early the minimum and the
+// factor are not written, for they are those of the formula; a promise that contradicts itself or what is known is
+// dropped. A minimum of 0 is no reason to expect an iteration, however large the multiple is: MUST_ITERATE(0,100,2) of
+// a loop over n == 0 elements runs none.
 
 #include "OPT5/dd/loop.h"
 
@@ -158,8 +158,7 @@ const NUMBERS_OF_PRAGMA& numbers_of(int kind) {
          {&LOOP::unPartitionedII, &LOOP::partitionedII, &LOOP::resII, &LOOP::recII, &LOOP::minII, &LOOP::estII}},
         {PRG_UNIT_RESOURCES,
          {&LOOP::LUnits, &LOOP::SUnits, &LOOP::DUnits, &LOOP::MUnits, &LOOP::addUnits, &LOOP::logicalUnits}},
-        {PRG_SP_HINDRANCES,
-         {&LOOP::reg_pressure, &LOOP::predicatePressure, &LOOP::live2longs, &LOOP::interruptLimit}},
+        {PRG_SP_HINDRANCES, {&LOOP::reg_pressure, &LOOP::predicatePressure, &LOOP::live2longs, &LOOP::interruptLimit}},
         {PRG_READ_WRITE, {&LOOP::Xpaths, &LOOP::Tpaths, &LOOP::longReads, &LOOP::longWrites}},
         {-1, {}},
     };
@@ -181,7 +180,8 @@ void set_from_numbers(int kind, struct LOOP* loop) {
     NODE*& field = loop->*field_of(kind);
     if (field) return;
     std::vector<std::string> args;
-    for (auto number : numbers_of(kind).numbers) args.push_back(decimal(INT65(static_cast<uint32_t>(loop->*number)) & type_mask(tp->uint_t)));
+    for (auto number : numbers_of(kind).numbers)
+        args.push_back(decimal(INT65(static_cast<uint32_t>(loop->*number)) & type_mask(tp->uint_t)));
     field = set_PPRAGMA_tree_info(nullptr, kind, args);
 }
 
@@ -271,9 +271,7 @@ ITERATE_PROMISE promise_of_MUST_ITERATE(const NODE* pragma) {
     return p;
 }
 
-void validate_MUST_ITERATE_pragma(NODE* pragma) {
-    write_promise(pragma, normal_form(promise_of_MUST_ITERATE(pragma)));
-}
+void validate_MUST_ITERATE_pragma(NODE* pragma) { write_promise(pragma, normal_form(promise_of_MUST_ITERATE(pragma))); }
 
 // A pragma that would say nothing is not made.
 void try_to_make_MUST_ITERATE_pragma(struct LOOP* loop) {
@@ -285,9 +283,9 @@ void try_to_make_MUST_ITERATE_pragma(struct LOOP* loop) {
     const bool says_something = (has_min && loop->minTrips->u.lval > INT65(1)) || max != no_trip_bound() ||
                                 (has_factor && loop->tripFactor->u.lval > INT65(1));
     if (!says_something) return;
-    loop->mustIterate = set_PPRAGMA_tree_info(
-        nullptr, PRG_MUST_ITERATE,
-        {has_min ? decimal(loop->minTrips->u.lval) : "", decimal(max), has_factor ? decimal(loop->tripFactor->u.lval) : ""});
+    loop->mustIterate = set_PPRAGMA_tree_info(nullptr, PRG_MUST_ITERATE,
+                                              {has_min ? decimal(loop->minTrips->u.lval) : "", decimal(max),
+                                               has_factor ? decimal(loop->tripFactor->u.lval) : ""});
 }
 
 namespace {
@@ -311,7 +309,8 @@ void assert_promises(const ITERATE_PROMISE& p, struct LOOP* loop) {
     const bool is_unsigned = type->is_unsigned();
     auto fits = [type](INT65 v) { return v <= int_type_max(type); };
     if (p.multiple > INT65(1) && fits(p.multiple))
-        add_trip_assertion(EQ, maketree(MOD, copy_tree(trips), mk_ICON(p.multiple, type), type), mk_ICON(INT65(0), type), loop);
+        add_trip_assertion(EQ, maketree(MOD, copy_tree(trips), mk_ICON(p.multiple, type), type),
+                           mk_ICON(INT65(0), type), loop);
     if (p.min > INT65(1) && fits(p.min))
         add_trip_assertion(is_unsigned ? UGE : GE, copy_tree(trips), mk_ICON(p.min, type), loop);
     if (p.max <= INT65(MOST_ASSERTED_TRIPS) && fits(p.max))
@@ -326,7 +325,8 @@ void reconcile_MUST_ITERATE_pragma(struct LOOP* loop) {
     if (!loop->mustIterate) return;
     const ITERATE_PROMISE stated = promise_of_MUST_ITERATE(loop->mustIterate);
     auto known = [](const NODE* t, INT65 otherwise) { return is_icon(t) ? t->u.lval : otherwise; };
-    const ITERATE_PROMISE proved = {max_of(known(loop->minTrips, INT65(0)), INT65(0)), known(loop->maxTrips, no_trip_bound()),
+    const ITERATE_PROMISE proved = {max_of(known(loop->minTrips, INT65(0)), INT65(0)),
+                                    known(loop->maxTrips, no_trip_bound()),
                                     max_of(known(loop->tripFactor, INT65(1)), INT65(1))};
     ITERATE_PROMISE both = joined(stated, proved);
     if (loop->has(LOOP_early_exit)) {
@@ -376,7 +376,8 @@ void clip_PROB_ITERATE_pragma(struct LOOP* loop) {
     const bool remains = clip_prob_iterate(loop->probIterate, low, high);
     INT65 max = get_PPRAGMA_tree_int_arg(loop->probIterate, 1);
     if (max <= INT65(0)) max = no_trip_bound();
-    if (!remains || (get_PPRAGMA_tree_int_arg(loop->probIterate, 0) <= low && max >= high)) erase_field(&loop->probIterate);
+    if (!remains || (get_PPRAGMA_tree_int_arg(loop->probIterate, 0) <= low && max >= high))
+        erase_field(&loop->probIterate);
 }
 
 // ---- Intake
@@ -519,12 +520,12 @@ void delete_pragmas_for_loop(struct LOOP* loop) {
     for (NODE* LOOP::*field : {&LOOP::sourceLoopPragma, &LOOP::mustIterate, &LOOP::probIterate, &LOOP::unrollPragma,
                                &LOOP::unrollAmountPragma})
         erase_field(&(loop->*field));
-    auto goes = [](int kind) {
+    auto is_of_counts = [](int kind) {
         return (kind >= PRG_UNROLL && kind <= PRG_SRC_LOOP) || kind == PRG_TRIP_CNTR_MUNGED || kind == PRG_LOOP_FLAGS ||
                kind == PRG_LOOP_NO_ALIAS;
     };
     for (LIST** link = &loop->preheader->statements; (*link)->rest;)
-        if ((*link)->first->op == PPRAGMA && goes((*link)->first->pragma->kind))
+        if ((*link)->first->op == PPRAGMA && is_of_counts((*link)->first->pragma->kind))
             drop_statement(link);
         else
             link = &(*link)->rest;

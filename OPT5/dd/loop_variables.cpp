@@ -1,11 +1,11 @@
-// Variables of loops beside their counts: who reads them, where they are dead, in which width they count, and the scalars
-// that a loop assigns.
+// Variables of loops beside their counts: who reads them, where they are dead, in which width they count, and the
+// scalars that a loop assigns.
 //
 // Needs: the hierarchy with its variables; trees in normal form. Leaves: the same; where a variable is replaced by a
 // narrower one its records follow, and live variables are not known any more.
 // Sound because a variable is made narrower only if every value that it takes fits, the one with which the loop is left
-// included: `for (k = 0; k < 32767; k += 2)` ends at 32768. Within a block a definition is forwarded as long as neither the
-// variable nor what it was computed from may change.
+// included: `for (k = 0; k < 32767; k += 2)` ends at 32768. Within a block a definition is forwarded as long as neither
+// the variable nor what it was computed from may change.
 
 #include "OPT5/dd/trip.h"
 
@@ -58,7 +58,8 @@ void check_if_LCV_used_in_loop(struct LOOP* loop, struct LOOP* inner) {
             INDUCTION_UPDATE update;
             const bool is_test = bb == tested_in && s->first->op == IF;
             const bool is_update = is_induction_update(s->first, &update) && update.sym == iv->sym;
-            if (is_test || s->first->op == NASSERT || (is_update && !sym_appears_in_tree(iv->sym, update.amount))) continue;
+            if (is_test || s->first->op == NASSERT || (is_update && !sym_appears_in_tree(iv->sym, update.amount)))
+                continue;
             if (sym_appears_in_tree(iv->sym, s->first)) iv->flags |= IV_used_in_loop;
         }
     });
@@ -73,7 +74,8 @@ namespace {
 bool is_live_behind(const SYMTAB* sym, const struct LOOP* loop) {
     const int bit = live_index(sym);
     if (bit < 0) return true;
-    return std::any_of(loop->exits.begin(), loop->exits.end(), [bit](const BBLK* bb) { return !live_at_entry_is_known(bb) || is_live_at_entry(bb, bit); });
+    return std::any_of(loop->exits.begin(), loop->exits.end(),
+                       [bit](const BBLK* bb) { return !live_at_entry_is_known(bb) || is_live_at_entry(bb, bit); });
 }
 
 } // namespace
@@ -83,7 +85,8 @@ void find_IVs_dead_on_exit(struct LOOP* top) {
     for (struct LOOP* loop : loops_inner_first(top)) {
         if (loop->is_root()) continue;
         for (const auto& iv : loop->IVs)
-            if (iv->has(IV_is_IV) && !iv->has(IV_is_RC | IV_is_VLCV | IV_dead_on_exit) && !is_live_behind(iv->sym, loop))
+            if (iv->has(IV_is_IV) && !iv->has(IV_is_RC | IV_is_VLCV | IV_dead_on_exit) &&
+                !is_live_behind(iv->sym, loop))
                 iv->flags |= IV_dead_on_exit;
     }
 }
@@ -92,27 +95,26 @@ void find_IVs_dead_on_exit(struct LOOP* top) {
 
 namespace {
 
-struct VALUE_RANGE {
-    WIDE_INT low, high;
-    bool fits(TYPE* type) const { return low >= wide_of(int_type_min(type)) && high <= wide_of(int_type_max(type)); }
-};
+bool fits(const RANGE& r, TYPE* type) {
+    return r.min >= to_wide(int_type_min(type)) && r.max <= to_wide(int_type_max(type));
+}
 
-std::optional<VALUE_RANGE> range_of(const NODE* t, struct LOOP* loop) {
-    INT65 min, max;
-    if (!t->type->is_int() || !calculate_bounds(t, loop, &min, &max)) return std::nullopt;
-    return VALUE_RANGE{wide_of(min), wide_of(max)};
+std::optional<RANGE> range_of(const NODE* t, struct LOOP* loop) {
+    RANGE r{0, 0};
+    return bounds_of(t, loop, &r) ? r : std::optional<RANGE>();
 }
 
 // The values that an affine variable takes, until behind the loop.
-std::optional<VALUE_RANGE> course_of(const LOOPIV* iv, struct LOOP* loop) {
-    if (!iv->init || !iv->incrtree || iv->incrtree->op != ICON || !loop->maxTrips || loop->maxTrips->op != ICON) return std::nullopt;
+std::optional<RANGE> course_of(const LOOPIV* iv, struct LOOP* loop) {
+    if (!iv->init || !iv->incrtree || iv->incrtree->op != ICON || !loop->maxTrips || loop->maxTrips->op != ICON)
+        return std::nullopt;
     auto r = range_of(iv->init, loop->parent);
     const INT65 trips = loop->maxTrips->u.lval;
     if (!r || trips > INT65(0x7fffffff)) return std::nullopt;
     // An iteration that is left before its end may have updated it.
-    const WIDE_INT updates = wide_of(trips) + (loop->is_bottom_tested() && !loop->has(LOOP_early_exit) ? 0 : 1);
-    const WIDE_INT way = updates * wide_of(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type));
-    (way > 0 ? r->high : r->low) += way;
+    const WIDE updates = to_wide(trips) + (loop->is_bottom_tested() && !loop->has(LOOP_early_exit) ? 0 : 1);
+    const WIDE distance = updates * to_wide(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type));
+    (distance > 0 ? r->max : r->min) += distance;
     return r;
 }
 
@@ -123,16 +125,19 @@ public:
     }
 
     bool is_possible() const {
-        if ((iv->flags & 0x3400) != (IV_affine | IV_is_IV) || iv->virtualInit || !iv->last || is_copy_of_counter(old)) return false;
-        if (!old->type->is_int() || old->type->size <= tp->int_t->size || !only_its_name_reaches(old) || sym_appears_in_EHT(old)) return false;
+        if ((iv->flags & 0x3400) != (IV_affine | IV_is_IV) || iv->virtualInit || !iv->last || is_copy_of_counter(old))
+            return false;
+        if (!old->type->is_int() || old->type->size <= tp->int_t->size || !only_its_name_reaches(old) ||
+            sym_appears_in_EHT(old))
+            return false;
         const auto course = course_of(iv, loop);
-        if (!course || !course->fits(type)) return false;
+        if (!course || !fits(*course, type)) return false;
         auto last = range_of(iv->last, loop);
         if (last && iv == loop->LCV && first_test_holds(loop)) { // it lies behind the start
-            if (iv->has(IV_increases)) last->low = std::max(last->low, course->low);
-            if (iv->has(IV_decreases)) last->high = std::min(last->high, course->high);
+            if (iv->has(IV_increases)) last->min = std::max(last->min, course->min);
+            if (iv->has(IV_decreases)) last->max = std::min(last->max, course->max);
         }
-        return last && last->fits(type) && has_only_updates();
+        return last && fits(*last, type) && has_only_updates();
     }
 
     void narrow() {
@@ -145,7 +150,8 @@ public:
         });
         insert_at_end_of_body(loop->preheader, mk_ASG(mk_NAME(made), coerce_to_type(type, mk_NAME(old))));
         for (BBLK* bb : loop->exits)
-            insert_before(&bb->statements, mk_ASG(mk_NAME(old), coerce_to_type(old->type->stqs(), mk_NAME(made))), bb->statements->psn);
+            insert_before(&bb->statements, mk_ASG(mk_NAME(old), coerce_to_type(old->type->stqs(), mk_NAME(made))),
+                          bb->statements->psn);
         update_records();
         forget_symbol_values();
         changed(fact::graph | fact::alias);
@@ -162,8 +168,11 @@ private:
                     only = u.amount->op == ICON && bb->loop == loop;
                     continue;
                 }
-                for_each_written_name(s->first, [&](const NODE* name, const NODE*) { only = only && name->u.sym != old; });
-                only = only && !any_subtree(s->first, [this](const NODE* t) { return t->op == UAND && t->left->op == NAME && t->left->u.sym == old; });
+                for_each_written_name(s->first,
+                                      [&](const NODE* name, const NODE*) { only = only && name->u.sym != old; });
+                only = only && !any_subtree(s->first, [this](const NODE* t) {
+                           return t->op == UAND && t->left->op == NAME && t->left->u.sym == old;
+                       });
             }
         });
         return only;
@@ -194,11 +203,13 @@ private:
 
     // (long)v < n as v < (int)n, where n fits.
     NODE* compared_narrow(NODE* n) {
-        auto is_widened = [this](const NODE* t) { return t->op == SCONV && t->left->op == NAME && t->left->u.sym == made; };
+        auto is_widened = [this](const NODE* t) {
+            return t->op == SCONV && t->left->op == NAME && t->left->u.sym == made;
+        };
         NODE **wide = is_widened(n->left) ? &n->left : &n->right, **other = wide == &n->left ? &n->right : &n->left;
         if (!is_widened(*wide) || (*other)->type->is_unsigned() != type->is_unsigned()) return n;
         const auto r = range_of(*other, loop);
-        if (!(r && r->fits(type)) && !is_limit(*other)) return n;
+        if (!(r && fits(*r, type)) && !is_limit(*other)) return n;
         NODE* cast = *wide;
         *wide = cast->left;
         erase_node(cast);
@@ -218,7 +229,8 @@ private:
         loop->record_of.erase(old);
         loop->record_of[made] = iv;
         iv->sym = made;
-        for (NODE** t : {&iv->init, &iv->last}) *t = normalize_tree(simp_tree(coerce_to_type(type, denormalize_tree(*t, false)), loop), nullptr);
+        for (NODE** t : {&iv->init, &iv->last})
+            *t = normalize_tree(simp_tree(coerce_to_type(type, denormalize_tree(*t, false)), loop), nullptr);
         const INT65 step = sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type);
         erase_tree(iv->incrtree);
         iv->incrtree = mk_ICON(step, tp->int_t);
@@ -270,7 +282,9 @@ public:
     }
 
 private:
-    static void count(uint16_t& counter) { counter = std::min<uint16_t>(static_cast<uint16_t>(counter + 1), MOST_LV_COUNT); }
+    static void count(uint16_t& counter) {
+        counter = std::min<uint16_t>(static_cast<uint16_t>(counter + 1), MOST_LV_COUNT);
+    }
 
     LOOPLV* record(const NODE* name, BBLK* bb) {
         SYMTAB* sym = name->u.sym;
@@ -345,7 +359,8 @@ constexpr int MOST_NODES = 999;
 bool is_forwarded(const NODE* t) {
     return t->op == ASG && is_private_name(t->left) && (t->right->op == ICON || is_private_name(t->right)) &&
            t->left->type->is_int() && t->right->type->is_int() && t->left->type->size == t->right->type->size &&
-           t->left->type->is_unsigned() == t->right->type->is_unsigned() && !sym_appears_in_tree(t->left->u.sym, t->right);
+           t->left->type->is_unsigned() == t->right->type->is_unsigned() &&
+           !sym_appears_in_tree(t->left->u.sym, t->right);
 }
 
 bool forward_in_block(BBLK* bb, struct LOOP* loop) {
@@ -356,8 +371,8 @@ bool forward_in_block(BBLK* bb, struct LOOP* loop) {
         if (t->op == PPRAGMA) continue;
         bool changed = false;
         for (const NODE* d : definitions) {
-            if (!sym_appears_in_tree(d->left->u.sym, t) || count_nodes_in_tree(t) > MOST_NODES || tree_modifies_lvalue_in_tree(t, d->left) ||
-                tree_modifies_lvalue_in_tree(t, d->right))
+            if (!sym_appears_in_tree(d->left->u.sym, t) || count_nodes_in_tree(t) > MOST_NODES ||
+                tree_modifies_lvalue_in_tree(t, d->left) || tree_modifies_lvalue_in_tree(t, d->right))
                 continue;
             t = subst_tree_for_lvalue_in_tree(d->right, d->left, t);
             changed = true;
@@ -365,7 +380,10 @@ bool forward_in_block(BBLK* bb, struct LOOP* loop) {
         s->first = t = changed ? simplified(t, loop) : t;
         any |= changed;
         definitions.erase(std::remove_if(definitions.begin(), definitions.end(),
-                                         [t](const NODE* d) { return tree_modifies_lvalue_in_tree(t, d->left) || tree_modifies_lvalue_in_tree(t, d->right); }),
+                                         [t](const NODE* d) {
+                                             return tree_modifies_lvalue_in_tree(t, d->left) ||
+                                                    tree_modifies_lvalue_in_tree(t, d->right);
+                                         }),
                           definitions.end());
         if (is_forwarded(t)) definitions.push_back(t);
     }
@@ -385,7 +403,8 @@ void prop_scalars_in_loop(struct LOOP* top, bool recurse, bool) {
         for (BBLK* bb : loop->contents) {
             if (bb->loop != loop) continue;
             make_plain(bb);
-            for (int n = 0; n < 4 && forward_in_block(bb, loop); ++n) {}
+            for (int n = 0; n < 4 && forward_in_block(bb, loop); ++n) {
+            }
         }
     for (struct LOOP* loop : loops)
         for (const auto& iv : loop->IVs) iv->flags &= ~IV_order;
@@ -399,11 +418,15 @@ void prop_IVs_and_RCs_in_loop(struct LOOP* top, bool recurse) {
     for (struct LOOP* loop : loops) {
         if (loop->is_root()) continue;
         for (const auto& iv : loop->IVs) {
-            if (!iv->has(IV_is_RC) || !iv->init || iv->init->op != ICON || !iv->sym->type->is_int() || !only_its_name_reaches(iv->sym)) continue;
-            NODE *name = mk_NAME(iv->sym), *value = mk_ICON(truncate_to_type(iv->init->u.lval, iv->sym->type), iv->sym->type->stqs());
+            if (!iv->has(IV_is_RC) || !iv->init || iv->init->op != ICON || !iv->sym->type->is_int() ||
+                !only_its_name_reaches(iv->sym))
+                continue;
+            NODE *name = mk_NAME(iv->sym),
+                 *value = mk_ICON(truncate_to_type(iv->init->u.lval, iv->sym->type), iv->sym->type->stqs());
             for_each_block(loop, [&](BBLK* bb) {
                 for (LIST* s = bb->statements; s; s = s->rest)
-                    if (s->first->op != PPRAGMA && sym_appears_in_tree(iv->sym, s->first)) s->first = simplified(subst_tree_for_lvalue_in_tree(value, name, s->first), loop);
+                    if (s->first->op != PPRAGMA && sym_appears_in_tree(iv->sym, s->first))
+                        s->first = simplified(subst_tree_for_lvalue_in_tree(value, name, s->first), loop);
             });
             erase_tree(name);
             erase_tree(value);
@@ -420,9 +443,12 @@ namespace {
 // x = (int)((long)x + 1) of a variable that never wraps as x = x + 1.
 void widen_update_of(LOOPIV* iv, LIST* s) {
     INDUCTION_UPDATE u;
-    if (!is_induction_update(s->first, &u) || u.sym != iv->sym || !u.is_narrowed || u.amount->op != ICON || !iv->sym->type->is_int()) return;
+    if (!is_induction_update(s->first, &u) || u.sym != iv->sym || !u.is_narrowed || u.amount->op != ICON ||
+        !iv->sym->type->is_int())
+        return;
     TYPE* type = iv->sym->type->stqs();
-    const INT65 amount = sign_extend_by_type_size(u.amount->u.lval, u.amount->type), step = u.is_subtracted ? -amount : amount;
+    const INT65 amount = sign_extend_by_type_size(u.amount->u.lval, u.amount->type),
+                step = u.is_subtracted ? -amount : amount;
     if (step > int_type_max(type) || (step < int_type_min(type) && !type->is_unsigned())) return;
     NODE* update = mk_ASG(mk_NAME(iv->sym, s->first->ls), maketree(PLUS, mk_NAME(iv->sym), mk_ICON(step, type), type));
     update->ls = s->first->ls;

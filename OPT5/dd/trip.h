@@ -4,25 +4,28 @@
 #include "OPT5/dd/loop.h"
 
 #include "OPT5/simp/linear.h"
+#include "OPT5/simp/range.h"
 
-// Numbers of 65 bits and their products.
-using WIDE_INT = __int128;
-WIDE_INT wide_of(INT65 v);
-INT65 int65_of(WIDE_INT v); // of a value in its range
+// The values of an integer tree; false for another.
+bool bounds_of(const NODE* tree, const struct LOOP* loop, RANGE* range);
+// A conversion that keeps every value of its operand.
+bool keeps_values(const NODE* conversion);
+// The condition of an assertion that can be asked, or null for another statement.
+const NODE* asserted_condition(const NODE* statement);
 
 // A new tree of values as they are written in statements.
 NODE* denormalized_copy(const NODE* tree);
 
-// Whether the exit test of the control variable would let the value on entry pass: so the guard of a bottom-tested loop,
-// or what is known of the values, says.
+// Whether the exit test of the control variable would let the value on entry pass: so the guard of a bottom-tested
+// loop, or what is known of the values, says.
 bool first_test_holds(const struct LOOP* loop);
 
 // Adds a multiple of the tree to the sum, by operators alone that give the number itself; false where that has no room.
 bool read_exact_sum(const NODE* tree, int64_t coefficient, LINEAR_FORM* sum);
 
 // Visits the straight line of blocks that ends in the loop's preheader, the nearest first, for as long as `visit(block,
-// test, sense)` returns true: the line came through the side `sense` of the block's IF `test`, which is null for another
-// end and for the preheader.
+// test, sense)` returns true: the line came through the side `sense` of the block's IF `test`, which is null for
+// another end and for the preheader.
 template <class F>
 void for_each_block_ahead(const struct LOOP* loop, F&& visit);
 

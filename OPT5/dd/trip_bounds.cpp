@@ -1,15 +1,15 @@
 // What is known of a trip count that is no constant: its bounds and a factor.
 //
 // The count is read as T(N) = (u*N + v) / w, with one term N that varies between entries; what facts of the loop, and
-// assertions and tests ahead of it, say of N is taken through that. A bound of the count is also how many different values
-// the control variable has.
+// assertions and tests ahead of it, say of N is taken through that. A bound of the count is also how many different
+// values the control variable has.
 //
-// Needs: `trips`, facts, the control variable. Leaves: `minTrips`, `maxTrips`, `tripFactor`; MUST_ITERATE and PROB_ITERATE in
-// step with them; `trips` as a constant where the bounds meet.
-// Sound because a test or an assertion ahead of the loop counts only if every path from it to the loop leaves N alone: in
-// `_nassert(n % 4 == 0); if (c) n++; for (i = 0; i < n; i++)` the arm is on no straight line, and still between the two. A
-// test counts only where the line comes through one side of it. Of a loop that may be left early the count is an upper bound
-// alone.
+// Needs: `trips`, facts, the control variable. Leaves: `minTrips`, `maxTrips`, `tripFactor`; MUST_ITERATE and
+// PROB_ITERATE in step with them; `trips` as a constant where the bounds meet. Sound because a test or an assertion
+// ahead of the loop counts only if every path from it to the loop leaves N alone: in
+// `_nassert(n % 4 == 0); if (c) n++; for (i = 0; i < n; i++)` the arm is on no straight line, and still between the
+// two. A test counts only where the line comes through one side of it. Of a loop that may be left early the count is an
+// upper bound alone.
 
 #include "OPT5/dd/trip.h"
 
@@ -28,33 +28,13 @@
 
 namespace {
 
-const WIDE_INT UNBOUNDED = (static_cast<WIDE_INT>(1) << 64) - 1;
+const WIDE UNBOUNDED = (static_cast<WIDE>(1) << 64) - 1;
 
-WIDE_INT gcd_of(WIDE_INT a, WIDE_INT b) {
+WIDE gcd_of(WIDE a, WIDE b) {
     if (a < 0) a = -a;
     if (b < 0) b = -b;
     while (b) std::swap(a %= b, b);
     return a;
-}
-
-struct BOUNDS {
-    WIDE_INT min, max;
-};
-
-bool bounds_of(const NODE* t, struct LOOP* loop, BOUNDS* b) {
-    INT65 min, max;
-    if (!calculate_bounds(t, loop, &min, &max)) return false;
-    *b = {wide_of(min), wide_of(max)};
-    return true;
-}
-
-// A conversion that keeps every value of its operand.
-bool keeps_values(const NODE* t) {
-    if (t->op != SCONV) return false;
-    const TYPE *to = t->type, *from = t->left->type;
-    if (!to->is_int() || !from->is_int() || from->is_bool() || to->is_bool()) return false;
-    if (to->is_unsigned() == from->is_unsigned()) return from->size <= to->size;
-    return from->is_unsigned() && from->size < to->size;
 }
 
 const NODE* without_conversions(const NODE* t) {
@@ -66,21 +46,21 @@ const NODE* without_conversions(const NODE* t) {
 
 struct TRIP_FORM {
     const NODE* term = nullptr; // N
-    WIDE_INT u = 1, v = 0, w = 1;
+    WIDE u = 1, v = 0, w = 1;
 
     // Of a dividend that is not negative the quotient is rounded down.
-    WIDE_INT at(WIDE_INT n) const {
-        const WIDE_INT sum = u * n + v;
+    WIDE at(WIDE n) const {
+        const WIDE sum = u * n + v;
         return sum < 0 ? 0 : sum / w;
     }
 };
 
-bool is_small(WIDE_INT v) { return v < (static_cast<WIDE_INT>(1) << 48) && v > -(static_cast<WIDE_INT>(1) << 48); }
+bool is_small(WIDE v) { return v < (static_cast<WIDE>(1) << 48) && v > -(static_cast<WIDE>(1) << 48); }
 
 // One operator below what was read so far; false where it is the term.
 bool peel(TRIP_FORM* f, bool* converted) {
     const NODE* t = f->term;
-    auto constant = [](const NODE* c) { return c->op == ICON ? wide_of(c->u.lval) : 0; };
+    auto constant = [](const NODE* c) { return c->op == ICON ? to_wide(c->u.lval) : 0; };
     const bool untouched = f->u == 1 && f->v == 0;
     if (keeps_values(t)) {
         *converted = true;
@@ -91,9 +71,9 @@ bool peel(TRIP_FORM* f, bool* converted) {
     switch (t->op) {
     case DIV:
     case SRL: {
-        const WIDE_INT c = constant(t->right);
+        const WIDE c = constant(t->right);
         if (!untouched || c <= 0 || !is_small(c) || (t->op == SRL && c > 40)) return false;
-        f->w *= t->op == DIV ? c : static_cast<WIDE_INT>(1) << c;
+        f->w *= t->op == DIV ? c : static_cast<WIDE>(1) << c;
         f->term = t->left;
         break;
     }
@@ -128,7 +108,7 @@ bool peel(TRIP_FORM* f, bool* converted) {
 }
 
 // Whether the tree has this form for every value of the term; the term is a part of the tree.
-bool read_form(const NODE* trips, struct LOOP* loop, TRIP_FORM* form, BOUNDS* term) {
+bool read_form(const NODE* trips, struct LOOP* loop, TRIP_FORM* form, RANGE* term) {
     if (!trips->type->is_int()) return false;
     form->term = trips;
     bool converted = false;
@@ -137,17 +117,18 @@ bool read_form(const NODE* trips, struct LOOP* loop, TRIP_FORM* form, BOUNDS* te
     if (!form->term->type->is_int() || !bounds_of(form->term, loop, term)) return false;
     if (!trips->type->is_unsigned()) return true;
     // Sums of numbers without a sign wrap.
-    const WIDE_INT a = form->u * term->min + form->v, b = form->u * term->max + form->v;
-    return form->u >= 0 && form->v >= 0 && std::max(a, b) <= wide_of(type_mask(trips->type)) && std::min(a, b) >= 0;
+    const WIDE a = form->u * term->min + form->v, b = form->u * term->max + form->v;
+    return form->u >= 0 && form->v >= 0 && std::max(a, b) <= to_wide(type_mask(trips->type)) && std::min(a, b) >= 0;
 }
 
 void divide_by_gcd(TRIP_FORM* f, const NODE* term) {
-    const WIDE_INT g = gcd_of(gcd_of(f->u, f->v), f->w);
+    const WIDE g = gcd_of(gcd_of(f->u, f->v), f->w);
     if (print_debug) {
-        auto text = [](WIDE_INT v, int slot) { return int2text(int65_of(v), tp->long_t, 10, slot); };
+        auto text = [](WIDE v, int slot) { return int2text(to_int65(v), tp->long_t, 10, slot); };
         const std::string n = tree_to_infix(term), u = text(f->u, 0), v = text(f->v, 1), w = text(f->w, 2);
         if (g > 1)
-            debug_printf("\tN == %s   u=%s, v=%s, w=%s, gcd=%s\n", n.c_str(), u.c_str(), v.c_str(), w.c_str(), text(g, 3));
+            debug_printf("\tN == %s   u=%s, v=%s, w=%s, gcd=%s\n", n.c_str(), u.c_str(), v.c_str(), w.c_str(),
+                         text(g, 3));
         else
             debug_printf("\tN == %s   u=%s, v=%s, w=%s\n", n.c_str(), u.c_str(), v.c_str(), w.c_str());
     }
@@ -160,23 +141,25 @@ void divide_by_gcd(TRIP_FORM* f, const NODE* term) {
 
 class TERM_FACTS {
 public:
-    TERM_FACTS(const TRIP_FORM& f, const BOUNDS& b) : form(f), range(b) {}
+    TERM_FACTS(const TRIP_FORM& f, const RANGE& b) : form(f), range(b) {}
 
     // The condition, or its opposite, holds on entry to the loop.
     void take(const NODE* condition, bool holds) {
-        visit_given(condition, holds, MOST_FACT_LEVELS, [this](const NODE* t, bool is_true) { take_simple(t, is_true); });
+        visit_given(condition, holds, MOST_FACT_LEVELS,
+                    [this](const NODE* t, bool is_true) { take_simple(t, is_true); });
     }
 
-    const BOUNDS& bounds() const { return range; }
-    WIDE_INT factor() const { return known_factor; }
+    const RANGE& bounds() const { return range; }
+    WIDE factor() const { return known_factor; }
 
 private:
     // N + k of a tree, which is a number; false for another.
-    bool is_term(const NODE* t, WIDE_INT* k) const {
+    bool is_term(const NODE* t, WIDE* k) const {
         *k = 0;
         t = without_conversions(t);
-        if ((t->op == PLUS || t->op == MINUS) && t->right->op == ICON && is_exact_by_rule(t->op, t->type) && !trees_are_congruent(t, form.term, false)) {
-            *k = t->op == PLUS ? wide_of(t->right->u.lval) : -wide_of(t->right->u.lval);
+        if ((t->op == PLUS || t->op == MINUS) && t->right->op == ICON && is_exact_by_rule(t->op, t->type) &&
+            !trees_are_congruent(t, form.term, false)) {
+            *k = t->op == PLUS ? to_wide(t->right->u.lval) : -to_wide(t->right->u.lval);
             t = without_conversions(t->left);
         }
         return trees_are_congruent(t, form.term, false);
@@ -194,15 +177,15 @@ private:
             op = commute_inv[op];
         }
         if (right->op != ICON || !left->type->is_int() || left->type->is_bool()) return;
-        const WIDE_INT c = wide_of(truncate_to_type(right->u.lval, left->type->stqs()));
+        const WIDE c = to_wide(truncate_to_type(right->u.lval, left->type->stqs()));
         if (op == EQ && c == 0) take_zero(left);
         if (op != EQ && op != NEQ && (op >= ULE) != left->type->is_unsigned()) return;
-        WIDE_INT k;
+        WIDE k;
         if (is_term(left, &k)) take_compare(op, c - k);
     }
 
-    void take_compare(int op, WIDE_INT c) {
-        BOUNDS r = range;
+    void take_compare(int op, WIDE c) {
+        RANGE r = range;
         switch (op) {
         case EQ: r = {std::max(r.min, c), std::min(r.max, c)}; break;
         case LT:
@@ -227,34 +210,29 @@ private:
             m += INT65(1);
             if (power_of_2(m) < 1) return;
         }
-        WIDE_INT k;
-        if (m < INT65(2) || !is_small(wide_of(m)) || !is_term(t->left, &k)) return;
+        WIDE k;
+        if (m < INT65(2) || !is_small(to_wide(m)) || !is_term(t->left, &k)) return;
         // N is m*q + r: T is (u*m/w) * q + (u*r + v) / w where w divides u*m.
-        const WIDE_INT modulus = wide_of(m), r = ((-k) % modulus + modulus) % modulus;
+        const WIDE modulus = to_wide(m), r = ((-k) % modulus + modulus) % modulus;
         if ((form.u * modulus) % form.w != 0) return;
-        WIDE_INT rest = form.u * r + form.v;
+        WIDE rest = form.u * r + form.v;
         rest = rest >= 0 ? rest / form.w : -((-rest + form.w - 1) / form.w);
-        const WIDE_INT f = gcd_of(form.u * modulus / form.w, rest);
+        const WIDE f = gcd_of(form.u * modulus / form.w, rest);
         if (print_debug)
-            debug_printf("\t%d == divisibility of %s by %s\n\n", f > 1, tree_to_infix(t->left).c_str(), int2text(m, tp->long_t, 10, 0));
-        const WIDE_INT both = known_factor / gcd_of(known_factor, f) * f;
+            debug_printf("\t%d == divisibility of %s by %s\n\n", f > 1, tree_to_infix(t->left).c_str(),
+                         int2text(m, tp->long_t, 10, 0));
+        const WIDE both = known_factor / gcd_of(known_factor, f) * f;
         if (is_small(both)) known_factor = both;
     }
 
     const TRIP_FORM& form;
-    BOUNDS range;
-    WIDE_INT known_factor = 1;
+    RANGE range;
+    WIDE known_factor = 1;
 };
 
 // ---- Where facts are looked for
 
 constexpr int MOST_BLOCKS = 64, MOST_STATEMENTS = 400;
-
-const NODE* asserted(const NODE* t) {
-    if (t->op != NASSERT && t->op != ASSERT) return nullptr;
-    const NODE* condition = t->left->op == COMMA ? t->left->left : t->left;
-    return tree_has_side_effects(condition) ? nullptr : condition;
-}
 
 // Back over the blocks that dominate the preheader, for as long as nothing changes the term.
 class DOMINATOR_WALK {
@@ -272,7 +250,7 @@ private:
         std::vector<const NODE*> trees;
         for (const LIST* s = bb->statements; s; s = s->rest) trees.push_back(s->first);
         for (size_t i = trees.size(); i > 0; --i) {
-            if (const NODE* condition = asserted(trees[i - 1])) facts->take(condition, true);
+            if (const NODE* condition = asserted_condition(trees[i - 1])) facts->take(condition, true);
             if (changes_term(trees[i - 1])) return false;
         }
         return true;
@@ -322,18 +300,18 @@ private:
 // ---- The count
 
 struct KNOWN_TRIPS {
-    WIDE_INT factor = 1, min = 0, max = UNBOUNDED;
+    WIDE factor = 1, min = 0, max = UNBOUNDED;
 
-    void bound(WIDE_INT low, WIDE_INT high) {
+    void bound(WIDE low, WIDE high) {
         low = std::max(min, low);
         high = std::min(max, high);
         if (low > high) return; // they contradict each other: what was known stands
         min = low;
         max = high;
     }
-    void round() {
+    void keep_multiples() {
         if (factor <= 1) return;
-        const WIDE_INT low = (min + factor - 1) / factor * factor, high = max == UNBOUNDED ? max : max / factor * factor;
+        const WIDE low = (min + factor - 1) / factor * factor, high = max == UNBOUNDED ? max : max / factor * factor;
         if (low <= high) min = low, max = high;
     }
 };
@@ -343,7 +321,8 @@ void bound_by_variable(struct LOOP* loop, KNOWN_TRIPS* known) {
     const LOOPIV* iv = loop->LCV;
     if (!iv || !iv->incrtree || iv->incrtree->op != ICON || iv->incrtree->u.lval.is_zero()) return;
     TYPE* type = iv->sym->type->stqs();
-    WIDE_INT range = wide_of(type_mask(type)), step = wide_of(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type));
+    WIDE range = to_wide(type_mask(type)),
+         step = to_wide(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type));
     if (!iv->has(IV_affine)) {
         // Only the test can end it, and does so within one turn or never.
         if (type->size < 64 && type->is_int() && !loop->has(LOOP_early_exit)) known->bound(0, range + 1);
@@ -351,7 +330,7 @@ void bound_by_variable(struct LOOP* loop, KNOWN_TRIPS* known) {
     }
     if (type->is_int()) {
         NODE* name = mk_NAME(iv->sym);
-        BOUNDS b{0, range};
+        RANGE b{0, range};
         if (bounds_of(name, loop, &b)) range = b.max - b.min;
         erase_tree(name);
     }
@@ -364,38 +343,38 @@ void refine_by_facts(const NODE* trips, struct LOOP* loop, KNOWN_TRIPS* known) {
         debug_printf("\n\tT(N) == %s\n", tree_to_infix(trips).c_str());
     }
     TRIP_FORM form;
-    BOUNDS term;
+    RANGE term;
     if (!read_form(trips, loop, &form, &term)) return;
     divide_by_gcd(&form, form.term);
     TERM_FACTS facts(form, term);
     for (int n = 0; n < 2; ++n) // what is not equal counts at an end that another fact gives
         for_each_given(loop, [&](const NODE* condition, bool holds) { facts.take(condition, holds); });
     DOMINATOR_WALK(form.term, &facts).from(loop->preheader);
-    const BOUNDS& n = facts.bounds();
-    const WIDE_INT a = form.at(n.min), b = form.at(n.max);
+    const RANGE& n = facts.bounds();
+    const WIDE a = form.at(n.min), b = form.at(n.max);
     known->bound(std::min(a, b), std::max(a, b));
-    const WIDE_INT both = known->factor / gcd_of(known->factor, facts.factor()) * facts.factor();
+    const WIDE both = known->factor / gcd_of(known->factor, facts.factor()) * facts.factor();
     if (both <= UNBOUNDED) known->factor = both;
 }
 
-void set_icon(NODE** field, WIDE_INT value) {
+void set_icon(NODE** field, WIDE value) {
     erase_tree(*field);
-    *field = mk_ICON(int65_of(value), tp->ullong_t);
+    *field = mk_ICON(to_int65(value), tp->ullong_t);
 }
 
 KNOWN_TRIPS known_of_tree(struct LOOP* loop) {
     KNOWN_TRIPS known;
     NODE* trips = loop->trips ? denormalized_copy(loop->trips) : nullptr;
     if (trips) {
-        BOUNDS b;
+        RANGE b;
         if (bounds_of(trips, loop, &b)) known.bound(b.min, b.max);
-        known.factor = std::max(wide_of(max_ICON_factor(trips, loop, true)), static_cast<WIDE_INT>(1));
+        known.factor = std::max(to_wide(max_ICON_factor(trips, loop, true)), static_cast<WIDE>(1));
     }
     if (loop->is_bottom_tested()) known.bound(1, UNBOUNDED);
     bound_by_variable(loop, &known);
-    known.round();
+    known.keep_multiples();
     if (trips && !tree_has_side_effects(trips)) refine_by_facts(trips, loop, &known);
-    known.round();
+    known.keep_multiples();
     erase_tree(trips);
     return known;
 }
@@ -405,8 +384,8 @@ KNOWN_TRIPS known_of_tree(struct LOOP* loop) {
 void characterize_trip_count(struct LOOP* loop) {
     KNOWN_TRIPS known;
     if (loop->trips && loop->trips->op == ICON) {
-        known.min = known.max = wide_of(loop->trips->u.lval);
-        known.factor = std::max(known.min, static_cast<WIDE_INT>(1));
+        known.min = known.max = to_wide(loop->trips->u.lval);
+        known.factor = std::max(known.min, static_cast<WIDE>(1));
     } else if (!loop->is_root())
         known = known_of_tree(loop);
     if (loop->has(LOOP_early_exit)) {
@@ -417,10 +396,11 @@ void characterize_trip_count(struct LOOP* loop) {
     set_icon(&loop->maxTrips, known.max);
     set_icon(&loop->tripFactor, known.factor);
     reconcile_MUST_ITERATE_pragma(loop);
-    if (loop->minTrips->u.lval == loop->maxTrips->u.lval && !loop->has(LOOP_early_exit) && !(loop->trips && loop->trips->op == ICON)) {
+    if (loop->minTrips->u.lval == loop->maxTrips->u.lval && !loop->has(LOOP_early_exit) &&
+        !(loop->trips && loop->trips->op == ICON)) {
         erase_tree(loop->trips);
         loop->trips = mk_ICON(loop->minTrips->u.lval, wide_enough_int_type(loop->minTrips->u.lval));
-        set_icon(&loop->tripFactor, std::max(wide_of(loop->minTrips->u.lval), static_cast<WIDE_INT>(1)));
+        set_icon(&loop->tripFactor, std::max(to_wide(loop->minTrips->u.lval), static_cast<WIDE>(1)));
     }
     clip_PROB_ITERATE_pragma(loop);
 }

@@ -1,15 +1,15 @@
 // How often a loop runs: `trips` is the number of executions of the tail for one entry.
 //
-// The test `v op limit` of the control variable, its value on entry and its step give the count: of constants, and of ends
-// at a constant distance, as a constant; otherwise as a tree over invariants of the loop, to be read ahead of it.
+// The test `v op limit` of the control variable, its value on entry and its step give the count: of constants, and of
+// ends at a constant distance, as a constant; otherwise as a tree over invariants of the loop, to be read ahead of it.
 //
-// Needs: the control variable with its test, limit, step and value on entry; facts of the loop. Leaves: `trips`, and the
-// affine flags that are proved.
-// Sound because differences are taken in a type that holds them: from -30000 to 30000 an int counter runs 60000 units. A
-// counter that may wrap has no count but by exact arithmetic modulo its width, and that only where it is unsigned: of
-// `u <= n` with n = 65535 there is no end. A bottom-tested loop runs once whatever its test says, so that its count is the
-// formula's only where the test would also pass on entry. Where a loop may be left before its test fails the formula is an
-// upper bound; it is none if the test is `!=` and the limit may lie on the other side of the start.
+// Needs: the control variable with its test, limit, step and value on entry; facts of the loop. Leaves: `trips`, and
+// the affine flags that are proved. Sound because differences are taken in a type that holds them: from -30000 to 30000
+// an int counter runs 60000 units. A counter that may wrap has no count but by exact arithmetic modulo its width, and
+// that only where it is unsigned: of `u <= n` with n = 65535 there is no end. A bottom-tested loop runs once whatever
+// its test says, so that its count is the formula's only where the test would also pass on entry. Where a loop may be
+// left before its test fails the formula is an upper bound; it is none if the test is `!=` and the limit may lie on the
+// other side of the start.
 
 #include "OPT5/dd/trip.h"
 
@@ -27,10 +27,25 @@
 #include <memory>
 #include <optional>
 
-WIDE_INT wide_of(INT65 v) {
-    return static_cast<WIDE_INT>(static_cast<unsigned __int128>(static_cast<WIDE_INT>(v.sign)) << 64 | v.value);
+bool bounds_of(const NODE* tree, const struct LOOP* loop, RANGE* range) {
+    if (!tree->type->is_int() || !has_value_range(tree->type)) return false;
+    *range = range_of_tree(tree, const_cast<struct LOOP*>(loop));
+    return true;
 }
-INT65 int65_of(WIDE_INT v) { return INT65(static_cast<int32_t>(v >> 64), static_cast<uint64_t>(v)); }
+
+bool keeps_values(const NODE* t) {
+    if (t->op != SCONV) return false;
+    const TYPE *to = t->type, *from = t->left->type;
+    if (!to->is_int() || !from->is_int() || from->is_bool() || to->is_bool()) return false;
+    if (to->is_unsigned() == from->is_unsigned()) return from->size <= to->size;
+    return from->is_unsigned() && from->size < to->size;
+}
+
+const NODE* asserted_condition(const NODE* t) {
+    if (t->op != NASSERT && t->op != ASSERT) return nullptr;
+    const NODE* condition = t->left->op == COMMA ? t->left->left : t->left;
+    return tree_has_side_effects(condition) ? nullptr : condition;
+}
 
 NODE* denormalized_copy(const NODE* tree) { return denormalize_tree(copy_tree(tree), false); }
 
@@ -42,9 +57,9 @@ struct TREE_ERASER {
 using OWNED_TREE = std::unique_ptr<NODE, TREE_ERASER>;
 
 struct LIMITS {
-    WIDE_INT low, high;
+    WIDE low, high;
 };
-LIMITS limits_of(TYPE* type) { return {wide_of(int_type_min(type)), wide_of(int_type_max(type))}; }
+LIMITS limits_of(TYPE* type) { return {to_wide(int_type_min(type)), to_wide(int_type_max(type))}; }
 
 // The integer type that a variable counts in.
 TYPE* counting_type(const SYMTAB* sym) { return sym->type->is_pointer() ? tp->long_t : sym->type->stqs(); }
@@ -53,20 +68,20 @@ bool is_inclusive(int op) { return op == LE || op == GE || op == ULE || op == UG
 bool goes_up(int op) { return op == LT || op == LE || op == ULT || op == ULE; }
 bool goes_down(int op) { return op == GT || op == GE || op == UGT || op == UGE; }
 
-WIDE_INT floor_div(WIDE_INT a, WIDE_INT b) { // b above 0
-    const WIDE_INT q = a / b;
+WIDE floor_div(WIDE a, WIDE b) { // b above 0
+    const WIDE q = a / b;
     return q - (a % b < 0 ? 1 : 0);
 }
-WIDE_INT ceil_div(WIDE_INT a, WIDE_INT b) { return -floor_div(-a, b); }
+WIDE ceil_div(WIDE a, WIDE b) { return -floor_div(-a, b); }
 
 // ---- The control variable's numbers
 
 struct COUNTER {
     const struct LOOP* loop;
-    TYPE* type;          // that it counts in
+    TYPE* type; // that it counts in
     bool is_pointer;
     OWNED_TREE init, limit; // of the variable's own type
-    WIDE_INT step;
+    WIDE step;
     int op;
     bool bottom; // tested behind the step
 
@@ -84,10 +99,18 @@ std::optional<COUNTER> counter_of(const struct LOOP* loop) {
     if (iv->init->type->is_pointer() != is_pointer || (!is_pointer && !iv->init->type->is_int())) return std::nullopt;
     if (own->size != other->size) return std::nullopt;
     TYPE* type = counting_type(iv->sym);
-    if (loop->test != EQ && loop->test != NEQ && !is_pointer && (loop->test >= ULE) != type->is_unsigned()) return std::nullopt;
+    if (loop->test != EQ && loop->test != NEQ && !is_pointer && (loop->test >= ULE) != type->is_unsigned())
+        return std::nullopt;
     const INT65 step = sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type);
     if (step.is_zero()) return std::nullopt;
-    COUNTER c{loop, type, is_pointer, OWNED_TREE(denormalized_copy(iv->init)), OWNED_TREE(denormalized_copy(iv->last)), wide_of(step), loop->test, loop->is_bottom_tested()};
+    COUNTER c{loop,
+              type,
+              is_pointer,
+              OWNED_TREE(denormalized_copy(iv->init)),
+              OWNED_TREE(denormalized_copy(iv->last)),
+              to_wide(step),
+              loop->test,
+              loop->is_bottom_tested()};
     if (!is_pointer) { // the value that the variable holds, and that it is compared with
         c.init.reset(coerce_to_type(type, c.init.release()));
         c.limit.reset(coerce_to_type(type, c.limit.release()));
@@ -95,11 +118,11 @@ std::optional<COUNTER> counter_of(const struct LOOP* loop) {
     return c;
 }
 
-WIDE_INT value_of(const NODE* icon, TYPE* type) { return wide_of(truncate_to_type(icon->u.lval, type)); }
+WIDE value_of(const NODE* icon, TYPE* type) { return to_wide(truncate_to_type(icon->u.lval, type)); }
 
 // ---- Constant ends
 
-bool passes(int op, WIDE_INT v, WIDE_INT limit) {
+bool passes(int op, WIDE v, WIDE limit) {
     switch (op) {
     case EQ: return v == limit;
     case NEQ: return v != limit;
@@ -114,9 +137,9 @@ bool passes(int op, WIDE_INT v, WIDE_INT limit) {
 }
 
 // The number of steps until the test fails, of numbers without bounds; nothing where it never does.
-std::optional<WIDE_INT> steps_to_exit(WIDE_INT init, WIDE_INT limit, WIDE_INT step, int op, int first) {
+std::optional<WIDE> steps_to_exit(WIDE init, WIDE limit, WIDE step, int op, int first) {
     if (!passes(op, init + first * step, limit)) return first;
-    const WIDE_INT distance = step > 0 ? limit - init : init - limit, size = step > 0 ? step : -step;
+    const WIDE distance = step > 0 ? limit - init : init - limit, size = step > 0 ? step : -step;
     if (op == EQ) return first + 1;
     if (op == NEQ) {
         if (distance < 0 || distance % size != 0) return std::nullopt;
@@ -126,9 +149,12 @@ std::optional<WIDE_INT> steps_to_exit(WIDE_INT init, WIDE_INT limit, WIDE_INT st
     return is_inclusive(op) ? floor_div(distance, size) + 1 : ceil_div(distance, size);
 }
 
-// The same of an unsigned variable that is tested for != and wraps: the least n with step * n == distance modulo 2^bits.
-std::optional<WIDE_INT> modular_steps(WIDE_INT distance, WIDE_INT step, unsigned bits, int first) {
-    auto reduced = [bits](WIDE_INT v) { return static_cast<unsigned __int128>(v) & ((static_cast<unsigned __int128>(1) << bits) - 1); };
+// The same of an unsigned variable that is tested for != and wraps: the least n with step * n == distance modulo
+// 2^bits.
+std::optional<WIDE> modular_steps(WIDE distance, WIDE step, unsigned bits, int first) {
+    auto reduced = [bits](WIDE v) {
+        return static_cast<unsigned __int128>(v) & ((static_cast<unsigned __int128>(1) << bits) - 1);
+    };
     const unsigned __int128 d = reduced(distance), s = reduced(step);
     if (s == 0) return std::nullopt;
     const int twos = __builtin_ctzll(static_cast<uint64_t>(s));
@@ -139,19 +165,19 @@ std::optional<WIDE_INT> modular_steps(WIDE_INT distance, WIDE_INT step, unsigned
     unsigned __int128 inverse = 1;
     if (bits > 2) {
         const INT65 power = ulong_expt(odd, (INT65(1) << INT65(bits - 2)) - INT65(1));
-        inverse = reduced(wide_of(power));
+        inverse = reduced(to_wide(power));
     } else
-        inverse = reduced(wide_of(odd));
-    WIDE_INT n = static_cast<WIDE_INT>(((d >> twos) * inverse) & ((static_cast<unsigned __int128>(1) << left) - 1));
-    if (n < first) n += static_cast<WIDE_INT>(1) << left;
-    if (n > wide_of(no_trip_bound())) return std::nullopt;
+        inverse = reduced(to_wide(odd));
+    WIDE n = static_cast<WIDE>(((d >> twos) * inverse) & ((static_cast<unsigned __int128>(1) << left) - 1));
+    if (n < first) n += static_cast<WIDE>(1) << left;
+    if (n > to_wide(no_trip_bound())) return std::nullopt;
     return n;
 }
 
 // Whether the value stays within the type until the loop is left behind `n` steps.
-bool stays_within(WIDE_INT init, WIDE_INT step, WIDE_INT n, TYPE* type) {
+bool stays_within(WIDE init, WIDE step, WIDE n, TYPE* type) {
     const LIMITS l = limits_of(type);
-    const WIDE_INT end = init + n * step;
+    const WIDE end = init + n * step;
     return l.low <= end && end <= l.high;
 }
 
@@ -165,24 +191,22 @@ public:
 private:
     bool opens(const NODE* t, const LINEAR_STEP& step) override {
         const TYPE* type = t->type;
-        if (wraps) return type->size >= form.bits && step.a->type->size >= form.bits && (!step.b || step.b->type->size >= form.bits);
-        if (t->op == SCONV) {
-            const TYPE* from = t->left->type;
-            if (!type->is_int() || !from->is_int() || from->is_bool()) return false;
-            if (from->is_unsigned() == type->is_unsigned()) return from->size <= type->size;
-            return from->is_unsigned() && from->size < type->size;
-        }
+        if (wraps)
+            return type->size >= form.bits && step.a->type->size >= form.bits &&
+                   (!step.b || step.b->type->size >= form.bits);
+        if (t->op == SCONV) return keeps_values(t);
         if (type->is_pointer()) return t->op == PLUS || t->op == MINUS || t->op == PCONV;
         return t->op == PMCONV || is_exact_by_rule(t->op, type);
     }
     bool wraps;
 };
 
-std::optional<WIDE_INT> constant_difference(const NODE* a, const NODE* b, unsigned bits, bool wraps) {
+std::optional<WIDE> constant_difference(const NODE* a, const NODE* b, unsigned bits, bool wraps) {
     if (tree_has_side_effects(a) || tree_has_side_effects(b)) return std::nullopt;
     LINEAR_FORM form(bits);
     DISTANCE_READER reader(&form, wraps);
-    if (!reader.read(a, 1) || !reader.read(b, -1) || !form.is_constant() || !(wraps || form.is_exact)) return std::nullopt;
+    if (!reader.read(a, 1) || !reader.read(b, -1) || !form.is_constant() || !(wraps || form.is_exact))
+        return std::nullopt;
     return form.constant;
 }
 
@@ -190,17 +214,20 @@ std::optional<WIDE_INT> constant_difference(const NODE* a, const NODE* b, unsign
 NODE* with_values_of_invariants(NODE* t, const struct LOOP* loop) {
     for (const struct LOOP* l = loop; l && !l->is_root(); l = l->parent)
         for (const auto& iv : l->IVs) {
-            if (!iv->has(IV_is_RC) || !iv->init || iv->init->type->size != iv->sym->type->size || !sym_appears_in_tree(iv->sym, t)) continue;
+            if (!iv->has(IV_is_RC) || !iv->init || iv->init->type->size != iv->sym->type->size ||
+                !sym_appears_in_tree(iv->sym, t))
+                continue;
             if (l != loop && !expr_is_constant(iv->init) && !tree_is_RC_in_loop(iv->init, l, false)) continue;
             OWNED_TREE name(mk_NAME(iv->sym)), value(denormalized_copy(iv->init));
-            if (!iv->sym->type->is_pointer() && iv->init->type->is_int()) value.reset(coerce_to_type(iv->sym->type->stqs(), value.release()));
+            if (!iv->sym->type->is_pointer() && iv->init->type->is_int())
+                value.reset(coerce_to_type(iv->sym->type->stqs(), value.release()));
             if (sym_appears_in_tree(iv->sym, value.get())) continue;
             t = subst_tree_for_lvalue_in_tree(value.get(), name.get(), t);
         }
     return t;
 }
 
-std::optional<WIDE_INT> difference_of_ends(const COUNTER& c, unsigned bits, bool wraps) {
+std::optional<WIDE> difference_of_ends(const COUNTER& c, unsigned bits, bool wraps) {
     if (auto d = constant_difference(c.limit.get(), c.init.get(), bits, wraps)) return d;
     const OWNED_TREE limit(with_values_of_invariants(copy_tree(c.limit.get()), c.loop));
     const OWNED_TREE init(with_values_of_invariants(copy_tree(c.init.get()), c.loop));
@@ -208,15 +235,15 @@ std::optional<WIDE_INT> difference_of_ends(const COUNTER& c, unsigned bits, bool
 }
 
 // limit - init where that is one number: of the values, not modulo their width.
-std::optional<WIDE_INT> known_distance(const COUNTER& c, bool passes_on_entry) {
+std::optional<WIDE> known_distance(const COUNTER& c, bool passes_on_entry) {
     if (c.is_pointer || !c.is_unsigned())
         if (auto d = difference_of_ends(c, 64, false)) return d;
     if (!passes_on_entry || (!goes_up(c.op) && !goes_down(c.op))) return std::nullopt;
     auto d = difference_of_ends(c, static_cast<unsigned>(c.type->size), true);
     if (!d || c.type->size > 64) return std::nullopt;
     // The test says on which side the limit lies.
-    const WIDE_INT turn = static_cast<WIDE_INT>(1) << c.type->size;
-    const WIDE_INT up = (*d % turn + turn) % turn;
+    const WIDE turn = static_cast<WIDE>(1) << c.type->size;
+    const WIDE up = (*d % turn + turn) % turn;
     return goes_up(c.op) ? up : up == 0 ? 0 : up - turn;
 }
 
@@ -237,14 +264,10 @@ TYPE* wider_type(const TYPE* type) {
     return nullptr;
 }
 
-struct BOUNDS {
-    WIDE_INT min, max;
-};
-BOUNDS bounds_of(const NODE* t, const struct LOOP* loop) {
-    INT65 min, max;
-    if (!calculate_bounds(t, const_cast<struct LOOP*>(loop), &min, &max))
-        return {wide_of(int_type_min(tp->llong_t)), wide_of(int_type_max(tp->ullong_t))};
-    return {wide_of(min), wide_of(max)};
+RANGE values_of(const NODE* t, const struct LOOP* loop) {
+    RANGE r{to_wide(int_type_min(tp->llong_t)), to_wide(int_type_max(tp->ullong_t))};
+    bounds_of(t, loop, &r);
+    return r;
 }
 
 NODE* as_count(const NODE* end, TYPE* type) {
@@ -253,9 +276,9 @@ NODE* as_count(const NODE* end, TYPE* type) {
     return simp_tree(coerce_to_type(type, t), nullptr);
 }
 
-// far - near as a number, which is not negative, and the bounds of that; in the variable's type if it holds it, also with
-// `more` added.
-NODE* distance_tree(const COUNTER& c, bool passes_on_entry, WIDE_INT more, BOUNDS* range) {
+// far - near as a number, which is not negative, and the bounds of that; in the variable's type if it holds it, also
+// with `more` added.
+NODE* distance_tree(const COUNTER& c, bool passes_on_entry, WIDE more, RANGE* range) {
     struct LOOP* loop = const_cast<struct LOOP*>(c.loop);
     const NODE *far = c.step > 0 ? c.limit.get() : c.init.get(), *near = c.step > 0 ? c.init.get() : c.limit.get();
     TYPE* type = c.type;
@@ -265,56 +288,59 @@ NODE* distance_tree(const COUNTER& c, bool passes_on_entry, WIDE_INT more, BOUND
     if (c.is_pointer)
         *range = {limits_of(type).low, limits_of(type).high - more};
     else {
-        const BOUNDS a = bounds_of(far, c.loop), b = bounds_of(near, c.loop);
+        const RANGE a = values_of(far, c.loop), b = values_of(near, c.loop);
         *range = {a.min - b.max, a.max - b.min};
         fits = (ordered || range->min >= limits_of(type).low) && range->max + more <= limits_of(type).high;
     }
     if (!fits) type = wider_type(type);
     if (!type) return nullptr;
     NODE* t = simp_node(maketree(MINUS, as_count(far, type), as_count(near, type), type), loop);
-    const BOUNDS of_tree = bounds_of(t, c.loop);
+    const RANGE of_tree = values_of(t, c.loop);
     range->min = std::max(range->min, of_tree.min);
     range->max = std::min(range->max, of_tree.max);
-    if (ordered) range->min = std::max(range->min, static_cast<WIDE_INT>(is_inclusive(c.op) ? 0 : 1));
+    if (ordered) range->min = std::max(range->min, static_cast<WIDE>(is_inclusive(c.op) ? 0 : 1));
     if (passes_on_entry && c.op == NEQ && range->min == 0) range->min = 1;
     return t;
 }
 
-NODE* plus(NODE* t, WIDE_INT v, struct LOOP* loop) {
+NODE* plus(NODE* t, WIDE v, struct LOOP* loop) {
     if (v == 0) return t;
     TYPE* type = t->type->stqs();
-    return simp_node(maketree(PLUS, t, mk_ICON(int65_of(v), type), type), loop);
+    return simp_node(maketree(PLUS, t, mk_ICON(to_int65(v), type), type), loop);
 }
 
 // The tree where it is the count, or null.
 NODE* symbolic_count(const COUNTER& c, bool passes_on_entry) {
     struct LOOP* loop = const_cast<struct LOOP*>(c.loop);
     if (c.op != NEQ && (c.step > 0 ? !goes_up(c.op) : !goes_down(c.op))) return nullptr;
-    const WIDE_INT size = c.step > 0 ? c.step : -c.step, more = (is_inclusive(c.op) ? 1 : 0) + (c.op == NEQ ? 0 : size - 1);
-    BOUNDS range{0, 0};
+    const WIDE size = c.step > 0 ? c.step : -c.step, more = (is_inclusive(c.op) ? 1 : 0) + (c.op == NEQ ? 0 : size - 1);
+    RANGE range{0, 0};
     OWNED_TREE t(distance_tree(c, passes_on_entry, more, &range));
     if (!t) return nullptr;
-    const WIDE_INT least = c.first_test() - (is_inclusive(c.op) ? 1 : 0);
-    const bool must_end = !c.loop->has(LOOP_early_exit) && !c.loop->has(LOOP_has_call) && (c.is_pointer || c.type->is_signed());
+    const WIDE least = c.first_test() - (is_inclusive(c.op) ? 1 : 0);
+    const bool must_end =
+        !c.loop->has(LOOP_early_exit) && !c.loop->has(LOOP_has_call) && (c.is_pointer || c.type->is_signed());
     if (range.min < least && !(c.op == NEQ && must_end)) return nullptr;
     if (range.max < least) return nullptr;
-    if (c.op == NEQ && !must_end && !(max_ICON_factor(t.get(), loop) % int65_of(size)).is_zero()) return nullptr;
+    if (c.op == NEQ && !must_end && !(max_ICON_factor(t.get(), loop) % to_int65(size)).is_zero()) return nullptr;
     range.min = std::max(range.min, least);
     if (!t->type->is_pointer() && range.min <= range.max)
-        t.reset(simp_tree_in_range(t.release(), int65_of(range.min), int65_of(range.max), INT65(1)));
+        t.reset(simp_tree_in_range(t.release(), to_int65(range.min), to_int65(range.max), INT65(1)));
     t.reset(plus(t.release(), more, loop));
     if (size == 1) return t.release();
     TYPE* type = t->type->stqs();
     if (size > limits_of(type).high) return nullptr;
-    NODE* divisor = mk_ICON(int65_of(size), type);
+    NODE* divisor = mk_ICON(to_int65(size), type);
     return simp_node(maketree(DIV, t.release(), divisor, type), loop);
 }
 
 // With a step that the program computes.
 NODE* count_by_computed_step(struct LOOP* loop) {
     LOOPIV* iv = loop->LCV;
-    if (!iv->sym->type->is_int() || iv->sym->type->is_unsigned() || !iv->has(IV_affine) || !iv->init || loop->trips) return nullptr;
-    if (iv->last->type->size != iv->sym->type->size || loop->test == NEQ || loop->test == EQ || loop->test >= ULE) return nullptr;
+    if (!iv->sym->type->is_int() || iv->sym->type->is_unsigned() || !iv->has(IV_affine) || !iv->init || loop->trips)
+        return nullptr;
+    if (iv->last->type->size != iv->sym->type->size || loop->test == NEQ || loop->test == EQ || loop->test >= ULE)
+        return nullptr;
     for (const NODE* t : {iv->init, iv->last, iv->incrtree})
         if (!expr_is_constant(t) && !tree_is_RC_in_loop(t, loop, false)) return nullptr;
     const int sign = sign_of_integer_expression(iv->incrtree, loop, false);
@@ -329,7 +355,8 @@ NODE* count_by_computed_step(struct LOOP* loop) {
         NODE* t = as_count(iv->incrtree, type);
         return sign > 0 ? t : simp_node(maketree(UMINUS, t, nullptr, type), loop);
     };
-    diff = simp_node(maketree(MINUS, simp_node(maketree(PLUS, diff, step(), type), loop), mk_ICON(INT65(1), type), type), loop);
+    diff = simp_node(
+        maketree(MINUS, simp_node(maketree(PLUS, diff, step(), type), loop), mk_ICON(INT65(1), type), type), loop);
     return simp_node(maketree(DIV, diff, step(), type), loop);
 }
 
@@ -340,10 +367,10 @@ struct COUNT {
     bool wraps = false; // exact, and the variable wraps on its course
 };
 
-NODE* count_icon(WIDE_INT n) { return mk_ICON(int65_of(n), wide_enough_int_type(int65_of(n))); }
+NODE* count_icon(WIDE n) { return mk_ICON(to_int65(n), wide_enough_int_type(to_int65(n))); }
 
 COUNT count_of_constants(const COUNTER& c) {
-    const WIDE_INT init = value_of(c.init.get(), c.type), limit = value_of(c.limit.get(), c.type);
+    const WIDE init = value_of(c.init.get(), c.type), limit = value_of(c.limit.get(), c.type);
     const auto n = steps_to_exit(init, limit, c.step, c.op, c.first_test());
     if (n && stays_within(init, c.step, *n, c.type)) return {count_icon(*n), false};
     if (!c.is_unsigned() || c.op != NEQ) return {};
@@ -375,7 +402,8 @@ bool first_test_holds(const struct LOOP* loop) {
     if (!iv || !iv->init || !iv->last || loop->is_root()) return false;
     struct LOOP* in = const_cast<struct LOOP*>(loop);
     OWNED_TREE init(denormalized_copy(iv->init)), limit(denormalized_copy(iv->last));
-    if (!iv->sym->type->is_pointer() && init->type->is_int()) init.reset(coerce_to_type(counting_type(iv->sym), init.release()));
+    if (!iv->sym->type->is_pointer() && init->type->is_int())
+        init.reset(coerce_to_type(counting_type(iv->sym), init.release()));
     if (init->type->is_pointer() != limit->type->is_pointer() || init->type->size != limit->type->size) return false;
     auto compared = [&](NODE* v) {
         NODE* t = maketree(loop->test, v, copy_tree(limit.get()), tp->int_t);
@@ -392,13 +420,16 @@ bool first_test_holds(const struct LOOP* loop) {
     for (const struct LOOP* l = loop; l; l = l->parent) {
         if (l->givens.size() > 64) break;
         for (const NODE* given : l->givens)
-            if (pred_implies_pred(given, true, entry.get()) == 1 || pred_implies_pred(given, true, simplified.get()) == 1) return true;
+            if (pred_implies_pred(given, true, entry.get()) == 1 ||
+                pred_implies_pred(given, true, simplified.get()) == 1)
+                return true;
     }
     bool holds = false, named_lives = true, entry_lives = true;
     int budget = 200;
     auto is_implied = [&](const NODE* by, bool sense) {
         auto implies = [&](const OWNED_TREE& q) { return pred_implies_pred(by, sense, q.get()) == 1; };
-        return !tree_has_side_effects(by) && ((named_lives && implies(named)) || (entry_lives && (implies(entry) || implies(simplified))));
+        return !tree_has_side_effects(by) &&
+               ((named_lives && implies(named)) || (entry_lives && (implies(entry) || implies(simplified))));
     };
     for_each_block_ahead(loop, [&](const BBLK* bb, const NODE* test, bool sense) {
         if (test && (holds = is_implied(test->left, sense))) return false;
@@ -407,7 +438,7 @@ bool first_test_holds(const struct LOOP* loop) {
         for (size_t i = trees.size(); i > 0; --i) {
             if (--budget < 0) return false;
             const NODE* t = trees[i - 1];
-            if (t->op == NASSERT && (holds = is_implied(t->left, true))) return false;
+            if (const NODE* fact = asserted_condition(t); fact && (holds = is_implied(fact, true))) return false;
             named_lives = named_lives && !tree_modifies_lvalue_in_tree(t, named.get());
             entry_lives = entry_lives && !tree_modifies_lvalue_in_tree(t, entry.get());
         }
@@ -423,12 +454,12 @@ namespace {
 // Every update of the control variable starts from a value that has passed the test, or from the one on entry.
 bool steps_stay_within(const COUNTER& c) {
     const LIMITS l = limits_of(c.type);
-    const WIDE_INT size = c.step > 0 ? c.step : -c.step;
-    const BOUNDS init = bounds_of(c.init.get(), c.loop), limit = bounds_of(c.limit.get(), c.loop);
+    const WIDE size = c.step > 0 ? c.step : -c.step;
+    const RANGE init = values_of(c.init.get(), c.loop), limit = values_of(c.limit.get(), c.loop);
     const bool first_fits = c.step > 0 ? init.max + size <= l.high : init.min - size >= l.low;
     const bool tested_first = !c.bottom || first_test_holds(c.loop);
     if (!first_fits && !tested_first) return false;
-    const WIDE_INT strict = is_inclusive(c.op) ? 0 : 1;
+    const WIDE strict = is_inclusive(c.op) ? 0 : 1;
     if (c.step > 0 && goes_up(c.op)) return limit.max - strict + size <= l.high;
     if (c.step < 0 && goes_down(c.op)) return limit.min + strict - size >= l.low;
     if (c.op != NEQ || size != 1) return false;
@@ -439,7 +470,7 @@ bool steps_stay_within(const COUNTER& c) {
 
 bool constant_course_stays_within(const COUNTER& c) {
     if (c.init->op != ICON || c.limit->op != ICON) return false;
-    const WIDE_INT init = value_of(c.init.get(), c.type);
+    const WIDE init = value_of(c.init.get(), c.type);
     const auto n = steps_to_exit(init, value_of(c.limit.get(), c.type), c.step, c.op, c.first_test());
     return n && stays_within(init, c.step, *n, c.type);
 }
@@ -466,21 +497,22 @@ void prove_IV_affine(LOOPIV* iv, const NODE* init, const NODE* last, INT65 incr,
     const SYM_RANGE* widened = find_widened_symbol_entry(iv->sym);
     TYPE* type = widened && widened->type ? widened->type : iv->sym->type->stqs();
     if (!type->is_int() || type->size > own->size || !init) return;
-    WIDE_INT most = wide_of(no_trip_bound());
-    if (trips && trips->type->is_int()) most = bounds_of(trips, loop).max;
-    if (loop->maxTrips && loop->maxTrips->op == ICON) most = std::min(most, wide_of(loop->maxTrips->u.lval));
-    if (most <= 0 || most == wide_of(no_trip_bound())) return;
+    WIDE most = to_wide(no_trip_bound());
+    if (trips && trips->type->is_int()) most = values_of(trips, loop).max;
+    if (loop->maxTrips && loop->maxTrips->op == ICON) most = std::min(most, to_wide(loop->maxTrips->u.lval));
+    if (most <= 0 || most == to_wide(no_trip_bound())) return;
     // The last, incomplete iteration may still update it.
     if (loop->has(LOOP_early_exit) || !loop->is_bottom_tested()) ++most;
-    const WIDE_INT range = (incr.is_negative() ? -wide_of(incr) : wide_of(incr)) * most;
+    const WIDE range = (incr.is_negative() ? -to_wide(incr) : to_wide(incr)) * most;
     const LIMITS l = limits_of(type);
     if (range > l.high - l.low) return;
-    const BOUNDS at = bounds_of(init, loop->parent);
+    const RANGE at = values_of(init, loop->parent);
     const bool up = !incr.is_negative();
-    bool stays = init->type->is_int() && at.min >= l.low && at.max <= l.high && (up ? at.max + range <= l.high : at.min - range >= l.low);
+    bool stays = init->type->is_int() && at.min >= l.low && at.max <= l.high &&
+                 (up ? at.max + range <= l.high : at.min - range >= l.low);
     // A value that has wrapped is nearer to the other end.
     if (!stays && last && iv != loop->LCV && last->type->is_int() && own->is_unsigned()) {
-        const BOUNDS end = bounds_of(last, loop);
+        const RANGE end = values_of(last, loop);
         stays = up ? end.min - range >= l.low : end.max + range <= l.high;
     }
     if (stays) iv->flags |= IV_affine;

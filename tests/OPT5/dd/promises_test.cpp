@@ -37,7 +37,8 @@ protected:
         return facts;
     }
     void set_counts(INT65 min, INT65 max, INT65 factor) {
-        for (auto [field, v] : {std::make_pair(&loop.minTrips, min), {&loop.maxTrips, max}, {&loop.tripFactor, factor}}) {
+        for (auto [field, v] :
+             {std::make_pair(&loop.minTrips, min), {&loop.maxTrips, max}, {&loop.tripFactor, factor}}) {
             erase_tree(*field);
             *field = mk_ICON(v, tp->ullong_t);
         }
@@ -83,7 +84,8 @@ TEST_F(Promises, FurtherPragmasOfAKind) {
         {PRG_UNROLL_AMOUNT, {"2"}, {"4"}, {"2"}},
         {PRG_SRC_LOOP, {"a.c:5", "i", "9", "for"}, {"3", "", "4", "do"}, {"a.c:5", "i", "9", "for"}},
     };
-    NODE* LOOP::*fields[] = {&LOOP::mustIterate, &LOOP::probIterate, &LOOP::unrollPragma, &LOOP::unrollAmountPragma, &LOOP::sourceLoopPragma};
+    NODE* LOOP::*fields[] = {&LOOP::mustIterate, &LOOP::probIterate, &LOOP::unrollPragma, &LOOP::unrollAmountPragma,
+                             &LOOP::sourceLoopPragma};
     size_t n = 0;
     for (const auto& row : rows) {
         take_loop_pragma(pragma(row.kind, row.near), &loop);
@@ -108,7 +110,7 @@ TEST_F(Promises, AreMadeOfWhatIsProved) {
     loop.flags = LOOP_early_exit;
     try_to_make_MUST_ITERATE_pragma(&loop);
     EXPECT_EQ(args_of(loop.mustIterate), (WORDS{"", "100", ""}));
-    // The promise counts what happens; the formula goes on behind the exit.
+    // The promise counts what happens; the formula counts on behind the exit.
     loop.mustIterate->pragma->args = {"4", "50", "4"};
     loop.trips = parser.parse("l");
     loop.RC_syms.insert(loop.trips->u.sym);
@@ -200,7 +202,8 @@ protected:
 };
 
 TEST_F(LoopPragmas, ComeOutOnceInTheirOrder) {
-    const int order[] = {125, 124, 123, 112, 66, 67, 65, 64, 63, 56, 68, 41, 38, 37, 39, 40, 121, 80, 60, 60, 42, 43, 44};
+    const int order[] = {125, 124, 123, 112, 66,  67, 65, 64, 63, 56, 68, 41,
+                         38,  37,  39,  40,  121, 80, 60, 60, 42, 43, 44};
     std::vector<std::pair<int, std::string>> want;
     for (int kind : order) want.emplace_back(kind, std::to_string(1000 + want.size()));
     want[11].second = "7"; // a line

@@ -104,7 +104,24 @@ void stopped(int n) {
     }
 }
 
+// What the next iteration alone reads is not computed on the edge back: the test stays the loop's end.
+// FUNCTION: carried
+// HAS: /MUST_ITERATE\("4", "4", "4"\)/
+// COUNT 1: goto
+long carried(int x) {
+    long s = 0;
+    int i;
+    for (i = 0; i < 4; i++) {
+        int y = g[i] + 2;
+        s = s * 3 + (x + 9) / 5;
+        g[i] = y;
+        x = y % 50;
+    }
+    return s;
+}
+
 int main(void) {
+    put_i32(carried(3));
     put_i32(narrowed());
     put_i32(too_far());
     put_i32(unknown_end(5));

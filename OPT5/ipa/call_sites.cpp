@@ -13,6 +13,7 @@
 #include "OPT5/ir/type_ops.h"
 
 #include <algorithm>
+#include <unordered_map>
 
 CALLSITE::~CALLSITE() { erase_tree(args); }
 
@@ -44,12 +45,13 @@ bool pointees_agree_in_const(TYPE* a, TYPE* b) {
     return !x || !y || x->is_const() == y->is_const();
 }
 
+// `parameter` is the type behind the names that the source gave it.
 bool pair_fits(const NODE* argument, TYPE* parameter) {
-    TYPE* type = argument->type;
+    TYPE* type = argument->type->real;
     const bool pointers = type->is_pointer() && parameter->is_pointer();
     if (compatible_types(type, parameter, true) && (!pointers || pointees_agree_in_const(type, parameter))) return true;
     if (argument->op == ARGREF && (parameter->is_csu() || parameter->is_float()))
-        return compatible_types(argument->left->type, parameter, true);
+        return compatible_types(argument->left->type->real, parameter, true);
     if (is_integer_kind(type) && is_integer_kind(parameter)) return true;
     if (pointers) {
         const TYPE *x = type->type_pointed_to(), *y = parameter->type_pointed_to();
@@ -76,7 +78,7 @@ bool arguments_fit_parameters(const NODE* call, const SYMTAB* callee) {
     const auto count = static_cast<size_t>(arg_list_count(arguments));
     if (count != parameters.size()) return false;
     for (size_t n = 0; n < count; ++n)
-        if (!pair_fits(arg_list_lookup(arguments, static_cast<int>(n)), parameters[n])) return false;
+        if (!pair_fits(arg_list_lookup(arguments, static_cast<int>(n)), parameters[n]->real)) return false;
     return true;
 }
 
@@ -97,9 +99,9 @@ public:
     COLLECTION(INLINE_FILE& f, int (*measure)(const BBLK*)) : file(f), pressure_of(measure) { need(fact::loops | fact::dominators); }
 
     void run() {
+        int request = 0; // in the pragmas ahead of a statement
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
             block = bb;
-            int request = 0;
             for (const LIST* s = bb->statements; s; s = s->rest) {
                 if (s->first->op == PPRAGMA) {
                     const int kind = s->first->pragma ? s->first->pragma->kind : 0;
@@ -107,7 +109,10 @@ public:
                     continue;
                 }
                 psn = s->psn;
-                visit(s->first, request, false);
+                // What the source has as one statement may have been taken apart, and over several blocks.
+                if (request) requests[psn] = request;
+                const auto found = psn ? requests.find(psn) : requests.end();
+                visit(s->first, found != requests.end() ? found->second : request, false);
                 request = 0;
             }
         }
@@ -177,6 +182,7 @@ private:
     }
 
     INLINE_FILE& file;
+    std::unordered_map<const PSN*, int> requests; // lookup only
     int (*const pressure_of)(const BBLK*);
     const BBLK* block = nullptr;
     const PSN* psn = nullptr;

@@ -1,6 +1,7 @@
 // Calls of small functions, and of functions with one call, become the function's body; a definition without a call that
 // is left is not written.
 // RUN: --opt_level=3
+// LEVELS: off 0 1 2 3 4
 #include <stdlib.h>
 #include <zrun.h>
 

@@ -1,6 +1,7 @@
 // At level 2 what the source asks for is inlined, and nothing else.
 // Definitions with a call or another use that is left are written, others are not.
 // RUN: --opt_level=2 --inline_recursion_limit=4
+// LEVELS: off 0 1 2 3 4
 // COUNT 0: function _of_inline
 // COUNT 1: function _by_word
 // COUNT 1: function _deep
@@ -63,6 +64,24 @@ int forced(int x) {
     h = plain(plain(x) + 1);
     h += plain(h);
     return h;
+}
+
+// The names of types say nothing, and a statement that is taken apart is still one.
+typedef float real;
+typedef struct { int a; long b; } couple;
+typedef int (*function)(int);
+static int of_names(real f, couple p, function g) { return (int)f + p.a + g(2); }
+static couple couple_of(int a) { couple p; p.a = a; p.b = a; return p; }
+// FUNCTION: in_parts
+// COUNT 0: _of_names(
+// COUNT 0: _couple_of(
+int in_parts(int n, float f) {
+    int s = 0, i;
+    for (i = 0; i < n; i++) {
+#pragma FORCEINLINE
+        s += of_names(f, couple_of(i), table[0]);
+    }
+    return s;
 }
 
 // Too many arguments, and a callee that counts its own.
@@ -131,6 +150,7 @@ int main(void) {
         put_i32(both(i * 4));
         put_i32(below(i));
         put_i32(frames(i));
+        put_i32(in_parts(i, i + 2.5f));
         put_i32(table[0](i) + in_table(i) + of_inline(i));
     }
     return 0;

@@ -6,6 +6,7 @@
   // HAS: x = y + 3                       a line of the dump; these lines stand in this order
   // NOT: goto                            appears in no line between the lines of HAS around it
   // COUNT 2: _f(                         appears so often in the whole part
+  // LEVELS: 0 3                          the program is optimized and executed at these levels, too
 
 HAS compares a whole line without its indentation, NOT and COUNT look inside of lines; a text between slashes is a
 regular expression, searched in the line by all three. Before the first FUNCTION the whole dump is looked at. Each
@@ -23,10 +24,10 @@ HERE = Path(__file__).resolve().parent
 sys.path.insert(0, str(HERE.parent.parent / "tools"))
 from zbench import Tools, Trouble, difference  # noqa: E402
 
-DIRECTIVE = re.compile(r"^\s*//\s*(RUN|FUNCTION|HAS|NOT|COUNT\s+\d+):\s*(.*?)\s*$")
+DIRECTIVE = re.compile(r"^\s*//\s*(RUN|LEVELS|FUNCTION|HAS|NOT|COUNT\s+\d+):\s*(.*?)\s*$")
 
 # A misspelt directive, or one that a formatter moved behind other words, must not pass for a comment.
-MISPLACED = re.compile(r"//\s*[A-Z]{3,}( \d+)?:|//.*\b(RUN|FUNCTION|HAS|NOT|COUNT \d+):")
+MISPLACED = re.compile(r"//\s*[A-Z]{3,}( \d+)?:|//.*\b(RUN|LEVELS|FUNCTION|HAS|NOT|COUNT \d+):")
 
 
 @dataclass(frozen=True)
@@ -58,11 +59,12 @@ class Section:
 class Case:
     words: list
     sections: list
+    levels: list
 
 
 def read_case(text):
     """The directives of a program's text; Trouble for what is no sound test."""
-    words, sections = None, [Section()]
+    words, sections, levels = None, [Section()], []
     for number, line in enumerate(text.splitlines(), 1):
         found = DIRECTIVE.match(line)
         if not found:
@@ -76,6 +78,8 @@ def read_case(text):
             if words is not None:
                 raise Trouble(f"line {number}: a second RUN")
             words = argument.split()
+        elif kind == "LEVELS":
+            levels += argument.split()
         elif kind == "FUNCTION":
             sections.append(Section(argument))
         else:
@@ -85,7 +89,7 @@ def read_case(text):
         raise Trouble("no RUN")
     if not any(section.expectations for section in sections):
         raise Trouble("nothing is expected")
-    return Case(words, sections)
+    return Case(words, sections, levels)
 
 
 def part_of(dump, function):
@@ -162,8 +166,13 @@ def judge(tools, source, folder):
         failures = check_dump(tools.dump(out), case)
         if before.status != 0:
             failures.append(f"unoptimized: status {before.status}: {before.errors.strip()}")
-        found = difference(before, after)
-        return failures + ([f"execution: {found}"] if found else [])
+        for level in ["", *case.levels]:
+            if level:
+                tools.optimize(unit, out, [*case.words, f"--opt_level={level}", "--debug:validate"])
+                after = tools.execute(out)
+            found = difference(before, after)
+            failures += [f"execution {level and f'at level {level}'}: {found}"] if found else []
+        return failures
     except Trouble as trouble:
         return [str(trouble)]
 

@@ -13,10 +13,16 @@ import unittest
 from dataclasses import dataclass, field
 from pathlib import Path
 
-from run import Tools, difference
+import read_functions as reader
+from run import HERE, Tools, difference
 
 DEPTH_LIMIT, MOST_NESTED, MOST_FORCED_DEEP = 10, 4000, 100000
 FORCED, DEEP, NEVER = "FORCEINLINE", "FORCEINLINE_RECURSIVE", "NOINLINE"
+INCLUDE = HERE.parent.parent / "tools" / "include"
+PROGRAMS = [HERE / "inlining.c", HERE / "inlining_forced.c"] + [
+    HERE.parent / "programs" / f"{name}.c" for name in ("function_pointers", "recursion", "side_effects", "struct_values")]
+DECISION = "--opt_passes=6,10,11"  # the steps that decide and expand, for speed
+CONSTANT_POINTERS = {"inlining": {"f": "pointed_to"}, "inlining_forced": {"table": "in_table"}}
 WISHES = ("",) * 12 + (FORCED, DEEP, NEVER)
 SIZES = (5, 6, 9, 10, 11, 19, 20, 20, 21, 21, 60, 98, 99, 100, 101)  # about the limits of the rules
 
@@ -26,6 +32,7 @@ class Call:
     callee: int
     pragma: str = ""
     line: int = 0
+    fits: bool = True  # the arguments the parameters
 
 
 @dataclass
@@ -41,6 +48,8 @@ class Function:
     always: bool = False
     cannot: bool = False
     taken: bool = False  # its address is
+    variadic: bool = False
+    through_pointer: bool = False  # it calls
 
     @property
     def size(self):
@@ -52,6 +61,50 @@ class Function:
         rest = max(size - self.size, 2)
         self.odd = rest % 2 == 1 and rest > 3
         self.stores = (rest - 3 * self.odd) // 2
+
+
+@dataclass
+class ReadFunction(Function):
+    """One of a C program; how large it is was read elsewhere."""
+    size: int = 0
+
+
+def read_program(source, sizes):
+    """The functions of a C program, those whose address is taken in this order, and how many have the size that a count
+    of the parser's trees gives. The others are read into other trees."""
+    unit = reader.unit_of([source], INCLUDE)
+    bodies = [item for item in unit.items if isinstance(item, reader.FunctionBody)]
+    constant = {pointer: next(s for s in unit.symbols if s.name == f"_{name}")
+                for pointer, name in CONSTANT_POINTERS.get(source.stem, {}).items()}
+    scans, index = [reader.Scan(body, constant) for body in bodies], {id(body.symbol): i for i, body in enumerate(bodies)}
+    named = [id(s) for s in reader.initializer_names(unit)] + \
+        [id(s) for scan in scans for s in scan.named if s not in constant.values()]
+    anonymous = list(dict.fromkeys(index[s] for s in named if s in index))
+    graph = []
+    for i, (body, scan) in enumerate(zip(bodies, scans)):
+        symbol = body.symbol
+        type_, has = reader.T.strip(symbol.type), lambda name: reader.has_pragma(symbol, name)
+        f = ReadFunction(symbol.name[1:], 0, len(body.parameters), old_style=not type_.prototype, taken=i in anonymous,
+                         inline=bool(symbol.qualifier_bits & symbol.INLINE_BIT), always=has("FUNC_ALWAYS_INLINE"),
+                         external=symbol.klass != symbol.STATIC, variadic=type_.variadic,
+                         through_pointer=scan.through_pointer, size=sizes.get(symbol.name[1:], scan.size))
+        own, wide = reader.has_its_own_frame(body, scan)
+        f.cannot = has("FUNC_CANNOT_INLINE") or own or (wide and not (f.inline or f.always)) or \
+            scan.never_returns or (scan.ends and not f.inline)
+        f.calls = [Call(index[id(callee)], pragma, line, reader.arguments_fit(call, bodies[index[id(callee)]]))
+                   for callee, pragma, line, call in scan.calls if id(callee) in index]
+        graph.append(f)
+    return graph, anonymous, sum(sizes.get(f.name) == scan.size for f, scan in zip(graph, scans))
+
+
+def with_wishes(text, seed):
+    """The text with statements of `main` forced and forbidden."""
+    rng = random.Random(seed)
+    lines = text.splitlines()
+    for i in range(next(i for i, line in enumerate(lines) if line.startswith("int main")) + 1, len(lines) * (seed > 0)):
+        if re.match(r"    (put_\w+|\w+ = \w+)\(.*\);$", lines[i]) and rng.random() < 0.4:
+            lines[i] = f"_Pragma(\"{rng.choice((FORCED, DEEP, NEVER))}\") {lines[i]}"
+    return "\n".join(lines)
 
 
 def below_size(graph, i):
@@ -129,12 +182,13 @@ class Options:
     def words(self):
         return [f"--opt_level={self.level}"] + [f"--auto_inline={self.auto}"] * (self.auto is not None) + \
             ["--disable_inlining"] * self.disabled + ["--single_inline"] * self.single + \
-            [f"--size_speed_goal={self.goal}"] * (self.goal is not None)
+            [f"--size_speed_goal={self.goal}"] * (self.goal is not None) + \
+            ["--print_debug=1"] * (self.level < 3)  # without it the info file is of levels from 3 on
 
 
 def all_cases():
     """Seed, graph and options; one limit is what some function comes to with all of its calls, or one less."""
-    for seed in range(27):
+    for seed in range(30):
         rng = random.Random(-seed)
         graph = random_graph(seed, seed % 4 == 3)
         source_of(graph)  # gives the calls their lines
@@ -174,26 +228,28 @@ def source_of(graph):
 class Prediction:
     """The rules by size, as they are meant."""
 
-    def __init__(self, graph, options):
+    def __init__(self, graph, options, anonymous=()):
         self.graph, self.level, self.disabled, self.single = graph, options.level, options.disabled, options.single
         level, auto, self.goal = options.level, options.auto, options.goal
         self.auto = 20 if auto is None else auto
-        self.main = len(graph) - 1
+        self.anonymous = anonymous  # what a call through a pointer may reach, in the order of the uses
         everyone = range(len(graph))
         self.root = [f.external or f.taken for f in graph]  # the rest of the program is not known
-        self.callers = [sum(c.callee == i for f in graph for c in f.calls) + (self.root[i] + graph[i].taken) for i in everyone]
+        self.below = [[c.callee for c in f.calls] + list(anonymous)[::-1] * f.through_pointer for f in graph]
+        self.callers = [sum(below.count(i) for below in self.below) + self.root[i] + graph[i].taken for i in everyone]
         self.order = self.number()
-        self.follows = {c.callee for i in everyone for c in graph[i].calls if self.order[i] >= self.order[c.callee]}
+        self.follows = {j for i in self.order for j in self.below[i] if self.order[i] >= self.order[j]}
         self.kept = {i for i, f in enumerate(graph) if self.root[i] or f.cannot or not (level > 2 or f.inline)}
         self.left, self.inlined, self.accepted, self.suppressed = list(self.callers), set(), {}, set()
-        self.time, self.costs, self.taken_in = [f.size for f in graph], {}, []
+        self.told = []  # caller, line, callee, its size and the cost of each accepted call, in this order
+        self.time, self.taken_in = [f.size for f in graph], []
         self.decide()
         self.integrate()
 
     def number(self):
         """Reverse postorder from the roots; the callee that was met last comes first."""
         def callees(i):
-            return list(dict.fromkeys(c.callee for c in self.graph[i].calls))[::-1]
+            return list(dict.fromkeys(self.below[i]))[::-1]
 
         roots = sorted((i for i in range(len(self.graph)) if self.root[i]), key=lambda i: "_" + self.graph[i].name)
         finished, seen = [], set()
@@ -212,7 +268,7 @@ class Prediction:
     def recursive_size(self, i, count):
         if i in self.follows or self.graph[i].cannot:
             return 0
-        calls = [c.callee for c in self.graph[i].calls]
+        calls = self.below[i]
         below = sum(self.recursive_size(j, calls.count(j)) for j in sorted(set(calls)) if j != i)
         return (self.graph[i].size + below) * count
 
@@ -221,7 +277,7 @@ class Prediction:
 
     def is_candidate(self, i, call):
         j, f = call.callee, self.graph[call.callee]
-        if call.pragma == NEVER or f.cannot or (j in self.follows and self.order[i] >= self.order[j]):
+        if call.pragma == NEVER or f.cannot or f.variadic or not call.fits or (j in self.follows and self.order[i] >= self.order[j]):
             return False
         if self.forced(call):
             return True
@@ -235,9 +291,9 @@ class Prediction:
         last = self.single and self.left[j] == 1 and j not in self.kept
         if self.auto == 0:
             return last
-        called = {c.callee for c in f.calls}
+        called = set(self.below[j])
         size = f.size + sum(self.graph[k].size for k in called if k in self.inlined)
-        if f.always or (size < 21 and len(called) <= 1):
+        if f.always or (size < 21 and len(called) + f.through_pointer <= 1):
             return True
         if size <= 99 and (self.level >= 3 or f.inline) and not f.external and j not in self.kept and not used and \
                 self.callers[j] == 1:
@@ -253,19 +309,23 @@ class Prediction:
                           lambda c: self.graph[c.callee].inline and self.recursive_size(c.callee, 1) < most,
                           lambda c: self.is_worth_it(c.callee)):
             for i, call in sites:
-                if call.line not in self.accepted and predicate(call):
-                    self.accepted[call.line] = call
+                if id(call) not in self.accepted and predicate(call):
+                    f = self.graph[call.callee]
+                    self.accepted[id(call)] = call
+                    self.told.append((self.graph[i].name, call.line, f.name, f.size, self.cost(call)))
                     self.inlined.add(call.callee)
                     self.left[call.callee] -= 1
                     self.grow(i, call)
                     if self.left[call.callee] == 0 and call.callee not in self.kept:
                         self.suppressed.add(call.callee)
 
+    def cost(self, call):
+        f = self.graph[call.callee]
+        return max(0, self.time[call.callee] - 2 - f.parameters * (3 if f.old_style else 2))
+
     def grow(self, i, call):
         """The caller gets longer, and with it everything that it is part of; a callee that goes takes no time."""
-        j, f = call.callee, self.graph[call.callee]
-        cost = max(0, self.time[j] - 2 - f.parameters * (3 if f.old_style else 2))
-        self.costs[call.line] = cost
+        j, cost = call.callee, self.cost(call)
 
         def add(to):
             self.time[to] += cost
@@ -294,7 +354,7 @@ class Prediction:
         def expand(i, depth, deep, left):
             nonlocal nested
             for call in self.graph[i].calls:
-                chosen = call.line in self.accepted
+                chosen = id(call) in self.accepted
                 fits = depth == 0 or nested < (MOST_FORCED_DEEP if deep else MOST_NESTED)
                 if call.callee in saved and (chosen or deep) and depth < DEPTH_LIMIT and fits:
                     nested += self.graph[call.callee].size if depth else 0
@@ -316,17 +376,21 @@ class Choice(unittest.TestCase):
         self.addCleanup(folder.cleanup)
         self.folder = Path(folder.name)
 
-    def check(self, graph, unit, words, prediction):
+    def compare_decisions(self, text, prediction, order=list):
+        site = r"call from _(\w+) \(\S+:(\d+)\) to _(\w+).* \(size (\d+) sites"
+        told = re.findall(rf"candidate:  {site}.* cost (\d+) temp", text)
+        self.assertEqual([row[:4] for row in told], re.findall(rf"^\[accepted:  {site}", text, re.M))
+        self.assertEqual(order((caller, int(line), callee, int(size), int(cost)) for caller, line, callee, size, cost in told),
+                         order(prediction.told))
+        self.assertEqual(set(re.findall(r"^Inlineable function will be suppressed: _(\w+)", text, re.M)),
+                         {prediction.graph[i].name for i in prediction.suppressed})
+
+    def check(self, unit, words, prediction):
         out, info = self.folder / "out.if", self.folder / "out.nfo"
-        self.tools.optimize(unit, out, [*words, "--debug:validate,inline_commentary", "--print_debug=1",
-                                        "--gen_opt_info=2", f"--opt_info_filename={info}"])
+        self.tools.optimize(unit, out, [*words, DECISION, "--debug:validate,inline_commentary", "--gen_opt_info=2",
+                                        f"--opt_info_filename={info}"])
         text, dump = info.read_text(), self.tools.dump(out)
-        accepted = {int(line) for line in re.findall(r"^\[accepted:  call from \S+ \(\S+:(\d+)\)", text, re.M)}
-        self.assertEqual(accepted, set(prediction.accepted))
-        costs = dict(re.findall(r"candidate:  call from \S+ \(\S+:(\d+)\).* cost (\d+) temp", text))
-        self.assertEqual({line: int(costs[str(line)]) for line in accepted}, prediction.costs)
-        for name, size in re.findall(r"^\[accepted: .*\) to _(\w+).* \(size (\d+) sites", text, re.M):
-            self.assertEqual(int(size), next(f.size for f in graph if f.name == name), name)
+        self.compare_decisions(text, prediction)
         bodies = {name: set(re.findall(r"\b_(\w+)\(", body)) for name, body in
                   re.findall(r"^function _(\w+):(.*?)^ +end function", dump, re.M | re.S)}
         self.assertEqual(bodies, prediction.calls_left)
@@ -341,9 +405,30 @@ class Choice(unittest.TestCase):
                 self.tools.parse(source, unit)
                 parsed = seed
             with self.subTest(seed=seed, options=options):
-                out = self.check(graph, unit, options.words, Prediction(graph, options))
+                out = self.check(unit, options.words, Prediction(graph, options))
                 if seed % 4 != 3 and options.level == 3:
                     self.assertEqual(self.tools.execute(out).status, 0)
+
+    def test_programs(self):
+        """Whole programs, as they are and with calls that are forced and forbidden at random."""
+        counted = 0
+        for path in PROGRAMS:
+            sizes = None
+            for seed in range(3):
+                source, unit, out, info = (self.folder / f"{path.stem}.{kind}" for kind in ("c", "if", "out.if", "nfo"))
+                source.write_text(with_wishes(path.read_text(), seed))
+                self.tools.parse(source, unit)
+                for options in (Options(2), Options(3), Options(3, 45), Options(2, None, True)):
+                    self.tools.optimize(unit, out, [*options.words, "--debug:inline_commentary", "--gen_opt_info=2",
+                                                    f"--opt_info_filename={info}"])
+                    if not sizes:
+                        sizes = {name: int(size) for name, size in re.findall(
+                            r"^Function _(\w+)\(\)\nIts integrable body size is (\d+)", unit.with_suffix(".odb").read_text(), re.M)}
+                    graph, anonymous, equal = read_program(source, sizes)
+                    counted += equal * (options == Options(3) and not seed)
+                    with self.subTest(program=path.name, seed=seed, options=options):
+                        self.compare_decisions(info.read_text(), Prediction(graph, options, anonymous), sorted)
+        self.assertGreaterEqual(counted, 45)
 
     def test_each_strategy(self):
         tight = ",inline_static_limit=101,inline_small_limit=1"

@@ -1,8 +1,8 @@
 // What the code generator is told of loops, and the entry points that do the work of a step in a frame of their own.
 //
-// The analysis for the code generator runs when registers have their variables: it brings even those that live in memory
-// into the form of references, builds the hierarchy, and keeps of each loop what its record says. Layout follows, so that the
-// records are settled behind it (loop_records.cpp).
+// The analysis for the code generator runs when registers have their variables: it brings even those that live in
+// memory into the form of references, builds the hierarchy, and keeps of each loop what its record says. Layout
+// follows, so that the records are settled behind it (loop_records.cpp).
 #include "OPT5/dd/dd.h"
 
 #include "BITVEC/bitvec.h"
@@ -50,8 +50,8 @@ bool delete_NASSERTs() {
     return any;
 }
 
-// Copies of memory have no destinations to be wrapped on this target; pairs of clones that lost one, banks of memory, and
-// the dependence graph are not built yet.
+// Copies of memory have no destinations to be wrapped on this target; pairs of clones that lost one, banks of memory,
+// and the dependence graph are not built yet.
 void wrap_memcpy_destinations() {}
 void unmark_singleton_clones(struct LOOP*) {}
 void write_dd_mbank_info() {}

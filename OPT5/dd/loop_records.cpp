@@ -1,10 +1,10 @@
-// The records of loops: what the hierarchy knows is kept by block, and becomes the record of a loop of the graph as it is
-// written, behind the layout.
+// The records of loops: what the hierarchy knows is kept by block, and becomes the record of a loop of the graph as it
+// is written, behind the layout.
 //
-// Sound because a loop of the final graph takes the numbers of one of the hierarchy only if it is that loop still: all that
-// leads back to its head belongs to that loop itself, all of it lies in that loop, and no other loop of the graph takes the
-// same. Layout moves and copies tests, and never an iteration. A loop that is not recognized has a record that promises
-// nothing.
+// Sound because a loop of the final graph takes the numbers of one of the hierarchy only if it is that loop still: all
+// that leads back to its head belongs to that loop itself, all of it lies in that loop, and no other loop of the graph
+// takes the same. Layout moves and copies tests, and never an iteration. A loop that is not recognized has a record
+// that promises nothing.
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/dd/loop.h"
@@ -77,7 +77,8 @@ private:
             waiting.pop_back();
             if (at) loops.push_back(at);
             std::vector<const NATURAL_LOOP*>& next = inside[at];
-            std::sort(next.begin(), next.end(), [](const NATURAL_LOOP* a, const NATURAL_LOOP* b) { return a->header->dfn > b->header->dfn; });
+            std::sort(next.begin(), next.end(),
+                      [](const NATURAL_LOOP* a, const NATURAL_LOOP* b) { return a->header->dfn > b->header->dfn; });
             waiting.insert(waiting.end(), next.begin(), next.end());
         }
     }

@@ -1,16 +1,16 @@
 // The normal form of memory references, and back.
 //
-// In normal form an indirection is UMULT(base, subscript): the base is a pointer without integer terms, the subscript, absent
-// for 0, the sum of the terms. A variable that memory holds is UMULT(UAND(NAME)), so that all references have one shape; a
-// variable of its function that nothing else reaches stays a NAME.
+// In normal form an indirection is UMULT(base, subscript): the base is a pointer without integer terms, the subscript,
+// absent for 0, the sum of the terms. A variable that memory holds is UMULT(UAND(NAME)), so that all references have
+// one shape; a variable of its function that nothing else reaches stays a NAME.
 //
 // Needs: the marks of aliased objects.
-// Leaves: the same values, the same accesses, each as volatile and as aligned as it was. What a reference may meet is asked
-// in this form as in the other.
-// Sound because a subscript is computed where it is exact: all partial sums are differences of pointers into one object in a
-// program without errors, so that they fit in the width of a pointer; in a narrower or an unsigned type only what the
-// simplifier proves not to wrap is summed up. `u + 65535u` as subscript of an object is one term: widened term by term it
-// would be another place. A term with effects stays where it is, so that effects keep their order.
+// Leaves: the same values, the same accesses, each as volatile and as aligned as it was. What a reference may meet is
+// asked in this form as in the other. Sound because a subscript is computed where it is exact: all partial sums are
+// differences of pointers into one object in a program without errors, so that they fit in the width of a pointer; in a
+// narrower or an unsigned type only what the simplifier proves not to wrap is summed up. `u + 65535u` as subscript of
+// an object is one term: widened term by term it would be another place. A term with effects stays where it is, so that
+// effects keep their order.
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/alias.h"
@@ -50,8 +50,7 @@ bool is_as_wide_as_addresses(const TYPE* t) { return t->size >= address_type()->
 
 bool keeps_values(const TYPE* from, const TYPE* to) {
     if (is_as_wide_as_addresses(to)) return true; // its bits are those of the address
-    return from->size < to->size ? from->is_unsigned() || !to->is_unsigned()
-                                 : from->is_unsigned() == to->is_unsigned();
+    return from->size < to->size ? from->is_unsigned() || !to->is_unsigned() : from->is_unsigned() == to->is_unsigned();
 }
 
 // The type that `a op b` of two terms is computed in, so that it is what the address is moved by.
@@ -97,6 +96,8 @@ bool is_pushable(const NODE* t, const TYPE* to) {
 }
 
 NODE* widened(TYPE* type, NODE* t) {
+    if (!t || !is_integral(type) || !is_integral(t->type))
+        optassert("tree != NULL && TYPE_IS_INT(nType) && TYPE_IS_INT(tree->type)", __FILE__, __LINE__);
     if (t->op == SCONV && is_integral(t->left->type) && t->left->type->size <= t->type->size &&
         keeps_values(t->left->type, t->type) && !t->type->is_bool())
         return widened(type, left_alone(t));
@@ -121,7 +122,8 @@ NODE* term_of(NODE* t) {
 // ---- Base and subscript
 
 bool is_wrapper(const NODE* p) {
-    return (p->op == PCONV || p->op == OUIALIGN || p->op == NONALIGN || p->op == ISP2CHAR) && p->left->type->is_pointer();
+    return (p->op == PCONV || p->op == OUIALIGN || p->op == NONALIGN || p->op == ISP2CHAR) &&
+           p->left->type->is_pointer();
 }
 
 // A pointer minus a pointer is no sum of integers; what has effects stays in its place among them.
@@ -159,7 +161,7 @@ NODE* without_terms(NODE* p, NODE* umult) {
 NODE* partition_pointer_under_UMULT(NODE* p, NODE* umult) {
     if (!is_wrapper(p)) return without_terms(p, umult);
     p->left = partition_pointer_under_UMULT(p->left, umult);
-    OPT_ASSERT(p->left != nullptr);
+    if (!p->left) optassert("ptr->left != NULL", __FILE__, __LINE__);
     return p;
 }
 
@@ -171,8 +173,8 @@ bool is_aggregate(const TYPE* t) { return t->is_array() || t->is_csu(); }
 
 // A variable that has a register rather than a place in memory.
 bool is_likely_in_register(const SYMTAB* sym) {
-    return (sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2 || sym->sclass == SC_PARM) && !sym->is_aliased() &&
-           !sym->type->is_volatile();
+    return (sym->sclass == SC_REGISTER || sym->sclass == SC_REGISTER2 || sym->sclass == SC_PARM) &&
+           !sym->is_aliased() && !sym->type->is_volatile();
 }
 
 bool stays_a_name(const NODE* t) {
@@ -233,7 +235,7 @@ NODE* normalize_UMULT(NODE* t, bool in_prolog) {
         return normalize_NAME(name, in_prolog);
     }
     t->left = partition_pointer_under_UMULT(t->left, t);
-    OPT_ASSERT(t->left != nullptr);
+    if (!t->left) optassert("tree->left != NULL", __FILE__, __LINE__);
     t->right = simp_ss_tree(t->right, nullptr);
     if (t->right && t->right->op == ICON && t->right->u.lval.is_zero()) {
         erase_tree(t->right);
@@ -331,7 +333,8 @@ void settle_alignment_mark(NODE* t) {
     TYPE* type = true_type(pointer, &exact);
     if (!type || !type->is_pointer()) return;
     const unsigned bits = type->qual_kind(false);
-    if (bits & (QUAL_CONST | QUAL_RESTRICT)) type = tp->mk_qual(type->stqs(), bits & ~unsigned(QUAL_CONST | QUAL_RESTRICT));
+    if (bits & (QUAL_CONST | QUAL_RESTRICT))
+        type = tp->mk_qual(type->stqs(), bits & ~unsigned(QUAL_CONST | QUAL_RESTRICT));
     pointer = coerce_to_type(type, pointer);
 }
 
@@ -421,10 +424,11 @@ NODE* strip_ddep_info_from_tree(NODE* tree) {
 
 namespace {
 
-// The copy of a parameter into a volatile scalar: it goes to a variable of its own, which bears the parameter's name as the
-// scalar does, and from there to the scalar.
+// The copy of a parameter into a volatile scalar: it goes to a variable of its own, which bears the parameter's name as
+// the scalar does, and from there to the scalar.
 bool split_copy(NODE* copy, LIST* prolog) {
-    if (copy->op != ASG || copy->left->op != NAME || !copy->left->type->is_scalar() || !copy->left->type->is_volatile()) return false;
+    if (copy->op != ASG || copy->left->op != NAME || !copy->left->type->is_scalar() || !copy->left->type->is_volatile())
+        return false;
     NODE* scalar = copy->left;
     SYMTAB* plain = copy_symbol(scalar->u.sym);
     plain->type = plain->orig_type = plain->type->stqs();

@@ -48,7 +48,8 @@ private:
         SYMTAB* defined = statement->op == ASG ? assigned_variable(statement) : nullptr;
         if (defined) references[defined].push_back({loop, true});
         for_each_subtree(statement, [&](const NODE* t) {
-            if (t->op == NAME && t->u.sym && !(defined && t == statement->left)) references[t->u.sym].push_back({loop, false});
+            if (t->op == NAME && t->u.sym && !(defined && t == statement->left))
+                references[t->u.sym].push_back({loop, false});
         });
     }
 
@@ -87,7 +88,8 @@ private:
         std::unordered_set<const BBLK*> seen{bb, loop->head}; // membership only
         std::vector<BBLK*> waiting;
         auto enter = [&](BBLK* to) {
-            if (to->loop && loop_is_subloop_of_loop(to->loop, loop, true) && seen.insert(to).second) waiting.push_back(to);
+            if (to->loop && loop_is_subloop_of_loop(to->loop, loop, true) && seen.insert(to).second)
+                waiting.push_back(to);
         };
         for (BBLK* to : from) enter(to);
         while (!waiting.empty()) {
@@ -114,7 +116,8 @@ private:
     bool every_exit_passes(const BBLK* bb, const struct LOOP* loop) {
         if (bb == loop->head) return true;
         if (leaves(loop->head, loop)) return false;
-        return each_block_short_of(successors_of(loop->head), bb, loop, [loop](const BBLK* at) { return !leaves(at, loop); });
+        return each_block_short_of(successors_of(loop->head), bb, loop,
+                                   [loop](const BBLK* at) { return !leaves(at, loop); });
     }
 
     bool keeps_its_value(const LIST* s, const BBLK* bb, const struct LOOP* loop) {

@@ -12,6 +12,7 @@
 #include "OPT5/ir/symbol_maps.h"
 
 #include <algorithm>
+#include <unordered_set>
 #include <vector>
 
 bool file_symbols_are_known = false;
@@ -176,16 +177,16 @@ void find_marks(FACTS wanted) {
     find_pointers(wanted, writes); // by the marks
 }
 
-// A mark too many is no fault; one too few is.
+// A mark too many is no fault; one too few is. Of the globals those are looked at that the function marks: there may be many.
 bool marks_still_hold() {
     std::vector<SYMTAB*> unmarked;
-    auto note = [&](SYMTAB* s) {
+    for_each_symbol([&](SYMTAB* s) {
         if (!s->is_aliased()) unmarked.push_back(s);
-    };
-    for_each_symbol(note);
-    for (SYMTAB* s = global_symbols; s; s = s->next) note(s);
+    });
+    const std::unordered_set<const SYMTAB*> before(marked_globals.begin(), marked_globals.end()); // membership only
     set_marks(nullptr);
-    return std::none_of(unmarked.begin(), unmarked.end(), [](const SYMTAB* s) { return s->is_aliased(); });
+    return std::none_of(unmarked.begin(), unmarked.end(), [](const SYMTAB* s) { return s->is_aliased(); }) &&
+           std::all_of(marked_globals.begin(), marked_globals.end(), [&](const SYMTAB* s) { return before.count(s) != 0; });
 }
 
 const FACT_FINDER marks("aliased objects", fact::alias_marks, fact::none, find_marks, nullptr, marks_still_hold,

@@ -2,7 +2,7 @@
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/effects.h"
-#include "OPT5/dd/loop.h"
+#include "OPT5/dd/trip.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
@@ -16,6 +16,7 @@
 #include "OPT5/simp/symbolic.h"
 
 #include <algorithm>
+#include <cstdint>
 
 bool is_private_scalar(const SYMTAB* sym) {
     return sym && sym->level == 2 && sym->type->is_scalar() && only_its_name_reaches(sym);
@@ -331,54 +332,16 @@ void LOOP_FACTS::find_tests() {
     }
 }
 
-namespace {
-
-bool stays(int op, int64_t value, int64_t limit) {
-    switch (op) {
-    case EQ: return value == limit;
-    case NEQ: return value != limit;
-    case LT:
-    case ULT: return value < limit;
-    case LE:
-    case ULE: return value <= limit;
-    case GT:
-    case UGT: return value > limit;
-    default: return value >= limit;
-    }
-}
-
-} // namespace
-
 int64_t constant_trip_count(const LOOP_TEST& test, int64_t* last_value) {
     const INDUCTION& i = *test.counter;
     if (!i.start_is_known || test.limit->op != ICON || !test.limit->u.lval.fits<int32_t>()) return -1;
     const int64_t by = i.steps.front().by, limit = in_type(test.limit->u.lval.fits_in<int32_t>(), i.sym->type);
-    int64_t value = i.start + (test.step_comes_first ? by : 0), trips = test.step_comes_first ? 1 : 0;
-    if (stays(test.stay_op, value, limit)) {
-        const int64_t distance = by > 0 ? limit - value : value - limit, size = by > 0 ? by : -by;
-        int64_t more = 0;
-        switch (test.stay_op) {
-        case LT:
-        case ULT:
-        case GT:
-        case UGT: more = (distance + size - 1) / size; break;
-        case LE:
-        case ULE:
-        case GE:
-        case UGE: more = distance / size + 1; break;
-        case NEQ:
-            if (distance % size) return -1;
-            more = distance / size;
-            break;
-        default: return -1;
-        }
-        if (distance < 0) return -1; // runs away from its limit
-        value += more * by;
-        trips += more;
-    }
-    if (stays(test.stay_op, value, limit) || in_type(value, i.sym->type) != value) return -1;
+    const auto trips = steps_to_exit(i.start, limit, by, test.stay_op, test.step_comes_first ? 1 : 0);
+    if (!trips || *trips > INT32_MAX) return -1;
+    const int64_t n = static_cast<int64_t>(*trips), value = i.start + n * by;
+    if (in_type(value, i.sym->type) != value) return -1;
     *last_value = value;
-    return trips;
+    return n;
 }
 
 // Whether the condition, which is consumed, holds where the loop is entered, by a test ahead of it that nothing behind it

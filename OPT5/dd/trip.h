@@ -6,12 +6,18 @@
 #include "OPT5/simp/linear.h"
 #include "OPT5/simp/range.h"
 
+#include <optional>
+
 // The values of an integer tree; false for another.
 bool bounds_of(const NODE* tree, const struct LOOP* loop, RANGE* range);
 // A conversion that keeps every value of its operand.
 bool keeps_values(const NODE* conversion);
 // The condition of an assertion that can be asked, or null for another statement.
 const NODE* asserted_condition(const NODE* statement);
+
+// The number of steps from `init` until `v op limit` fails, of numbers without bounds, at least `first` (0 or 1); nothing
+// where it never does.
+std::optional<WIDE> steps_to_exit(WIDE init, WIDE limit, WIDE step, int op, int first);
 
 // A new tree of values as they are written in statements.
 NODE* denormalized_copy(const NODE* tree);

@@ -136,7 +136,8 @@ bool passes(int op, WIDE v, WIDE limit) {
     }
 }
 
-// The number of steps until the test fails, of numbers without bounds; nothing where it never does.
+} // namespace
+
 std::optional<WIDE> steps_to_exit(WIDE init, WIDE limit, WIDE step, int op, int first) {
     if (!passes(op, init + first * step, limit)) return first;
     const WIDE distance = step > 0 ? limit - init : init - limit, size = step > 0 ? step : -step;
@@ -148,6 +149,8 @@ std::optional<WIDE> steps_to_exit(WIDE init, WIDE limit, WIDE step, int op, int 
     if (step > 0 ? !goes_up(op) : !goes_down(op)) return std::nullopt;
     return is_inclusive(op) ? floor_div(distance, size) + 1 : ceil_div(distance, size);
 }
+
+namespace {
 
 // The same of an unsigned variable that is tested for != and wraps: the least n with step * n == distance modulo
 // 2^bits.

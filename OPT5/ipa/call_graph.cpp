@@ -251,38 +251,47 @@ void add_edges(FUNINFO* f, GRAPH& graph) {
             if (function_is_defined(c->callee)) edge_to(c->callee);
 }
 
-std::vector<std::unique_ptr<BITVEC>> reach_sets; // by strong component; its functions share the set
+std::unique_ptr<GRAPH> calls; // who may call whom, by the numbers of the functions
+std::vector<std::unique_ptr<BITVEC>> reach_sets; // of the functions that were asked about; all of them take n^2 bits
 
-// The transitive closure, by strong components: their numbers come in the order of a walk that finishes what a
-// component reaches before the component itself, so that one pass in that order sees every successor's set complete.
-void compute_reach(const std::vector<FUNINFO*>& order) {
-    const size_t n = order.size();
-    GRAPH graph(n);
-    for (FUNINFO* f : order) add_edges(f, graph);
-    std::vector<size_t> component(n);
-    const size_t components = boost::strong_components(graph, component.data());
-    std::vector<std::vector<size_t>> members(components);
-    for (size_t v = 0; v < n; ++v) members[component[v]].push_back(v);
-    reach_sets.clear();
-    for (size_t c = 0; c < components; ++c) {
-        auto set = std::make_unique<BITVEC>(static_cast<uint32_t>(n));
-        bool has_cycle = false;
-        for (size_t v : members[c])
-            for (auto [e, end] = boost::out_edges(v, graph); e != end; ++e) {
-                const size_t to = boost::target(*e, graph);
-                if (component[to] == c) {
-                    has_cycle = true;
-                } else if (!set->test(static_cast<uint32_t>(to))) {
-                    set->set(static_cast<uint32_t>(to));
-                    *set |= *reach_sets[component[to]];
-                }
-            }
-        for (size_t v : members[c]) {
-            if (has_cycle) set->set(static_cast<uint32_t>(v));
-            order[v]->reach = set.get();
-        }
-        reach_sets.push_back(std::move(set));
+void build_graph(const std::vector<FUNINFO*>& order) {
+    calls = std::make_unique<GRAPH>(order.size());
+    for (FUNINFO* f : order) {
+        f->reach = nullptr;
+        add_edges(f, *calls);
     }
+    reach_sets.clear();
+}
+
+const BITVEC& reach_of(FUNINFO* f) {
+    if (f->reach) return *f->reach;
+    reach_sets.push_back(std::make_unique<BITVEC>(static_cast<uint32_t>(boost::num_vertices(*calls))));
+    BITVEC& set = *reach_sets.back();
+    std::vector<size_t> work{static_cast<size_t>(f->cg_order)};
+    while (!work.empty()) {
+        const size_t from = work.back();
+        work.pop_back();
+        for (auto [e, end] = boost::out_edges(from, *calls); e != end; ++e) {
+            const size_t to = boost::target(*e, *calls);
+            if (set.test(static_cast<uint32_t>(to))) continue;
+            set.set(static_cast<uint32_t>(to));
+            work.push_back(to);
+        }
+    }
+    f->reach = &set;
+    return set;
+}
+
+// The functions that may be entered while they run: those of a strong component with an edge inside.
+std::vector<bool> on_cycles() {
+    const size_t n = boost::num_vertices(*calls);
+    std::vector<size_t> component(n);
+    std::vector<bool> has_cycle(boost::strong_components(*calls, component.data())), result(n);
+    for (size_t v = 0; v < n; ++v)
+        for (auto [e, end] = boost::out_edges(v, *calls); e != end; ++e)
+            if (component[boost::target(*e, *calls)] == component[v]) has_cycle[component[v]] = true;
+    for (size_t v = 0; v < n; ++v) result[v] = has_cycle[component[v]];
+    return result;
 }
 
 } // namespace
@@ -292,11 +301,12 @@ void detect_recursion() {
     if (!cg_list) return;
     std::vector<FUNINFO*> order;
     for (FUNLIST* p = cg_list; p; p = p->next) order.push_back(p->fun);
-    compute_reach(order);
+    build_graph(order);
     if (!write_opt_info) return;
+    const std::vector<bool> recursive = on_cycles();
     bool any = false;
     for (const FUNINFO* f : order) {
-        if (f == program.file_fun || !f->reach->test(static_cast<uint32_t>(f->cg_order))) continue;
+        if (f == program.file_fun || !recursive[static_cast<size_t>(f->cg_order)]) continue;
         if (!any) info_printf("\nThese functions may be recursive:\n");
         any = true;
         info_printf("\t%s()\n", f->name.c_str());
@@ -310,8 +320,10 @@ bool call_may_be_recursive(const NODE* call) {
     if (!op_is_call(call->op)) return false;
     FUNINFO* callee = find_FUNINFO_for_call(call);
     if (!callee || !function_is_defined(callee)) callee = program.file_fun;
-    if (!callee || !callee->reach || !currfuninfo || currfuninfo->cg_order < 0) return true;
-    return callee->reach->test(static_cast<uint32_t>(currfuninfo->cg_order));
+    const size_t known = calls ? boost::num_vertices(*calls) : 0;
+    auto is_known = [known](const FUNINFO* f) { return f && f->cg_order >= 0 && static_cast<size_t>(f->cg_order) < known; };
+    if (!is_known(callee) || !is_known(currfuninfo)) return true;
+    return reach_of(callee).test(static_cast<uint32_t>(currfuninfo->cg_order));
 }
 
 // ---- Reports

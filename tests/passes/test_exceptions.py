@@ -69,10 +69,10 @@ class Program:
 
     def region(self, i, depth):
         rng, out = self.rng, self.lines.append
-        kind = rng.choice(("catch", "catch", "cleanup", "pass"))
+        kind = rng.choice(("catch",) * 4 + ("cleanup(undo(&u))",) * 2 + ("pass()",) * 2 + ("terminate()",))
         if kind != "catch":
-            out(f"    {'__eh_cleanup(undo(&u))' if kind == 'cleanup' else '__eh_pass()'};")
-            self.statements(i, depth + 1, rng.randint(1, 3))
+            out(f"    __eh_{kind};")
+            self.statements(i, depth + 1, 1 if kind == "terminate()" else rng.randint(1, 3))
             out("    __eh_end();")
             return
         self.labels += 1

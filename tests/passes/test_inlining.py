@@ -444,6 +444,36 @@ class Choice(unittest.TestCase):
                     if limits and strategy > 2:  # what was undone is checked by the optimizer itself
                         self.assertIn("too big", info.read_text())
 
+    def test_which_definitions_stay(self):
+        """What is used otherwise than by expanded calls stays; of what went nothing is left."""
+        plain = "static inline int f(int a) { return a * 3 + g; }"
+        for definition, use, levels in (
+                (plain, "put_i32(f(2));", ""),
+                (plain, "int (*p)(int) = f; put_i32(p(2) + f(3));", ""),
+                (plain, "int (*p)(int) = x ? f : f; put_i32(p(2));", ""),
+                (plain + " static int (*const t[])(int) = {f};", "put_i32(t[0](2));", "23"),
+                (plain + " int (*t[])(int) = {f};", "put_i32(f(2)); put_i32(t[x](2));", "23"),
+                (plain, "int (*volatile p)(int) = f; put_i32(p(2) + f(3));", "23"),
+                (plain, "put_i32(f(2)); put_i32(kept == f);", "23"),
+                (plain, 'put_i32(f(2));\n#pragma NOINLINE\nput_i32(f(3));', "23"),
+                (plain.replace("static inline ", ""), "put_i32(f(2));", "23"),
+                ("#pragma RETAIN(f)\n" + plain, "put_i32(f(2));", "23"),
+                ("#pragma FUNC_CANNOT_INLINE(f)\n" + plain, "put_i32(f(2));", "23"),
+                ("#pragma INTERRUPT(f)\nstatic void f(void) { g++; }", "", "23"),
+                (plain + '\nasm(" .word _f");', "put_i32(f(2));", "23")):
+            source, unit, out = (self.folder / name for name in ("kept.c", "kept.if", "kept.out.if"))
+            source.write_text(f"#include <zrun.h>\nint g = 5, x; int (*kept)(int);\n{definition}\n"
+                              f"int main(void) {{\n{use}\nreturn 0; }}\n")
+            self.tools.parse(source, unit)
+            for level in "23":
+                with self.subTest(definition=definition, use=use, level=level):
+                    self.tools.optimize(unit, out, [f"--opt_level={level}", "--debug:validate"])
+                    self.assertIsNone(difference(self.tools.execute(unit), self.tools.execute(out)))
+                    dump = self.tools.dump(out)
+                    self.assertEqual("function _f:" in dump, level in levels)
+                    if level not in levels:  # what remains is the symbol's own record, without the place of a body
+                        self.assertRegex(dump, r"(?s)\A(?!.*\b_f\b.*\b_f\b)(?!.*\b_f: [^\n]* at 0x)")
+
     def test_orders_without_the_step_that_takes_suppressed_functions_out(self):
         unit, out = self.folder / "inlining.if", self.folder / "inlining.out.if"
         self.tools.parse(Path(__file__).parent / "inlining.c", unit)

@@ -61,10 +61,11 @@ bool is_float_copy(const NODE* t) {
     return !tree_is_arg_prolog(t);
 }
 
-// `t = a; a = b; b = t;` from this cell on.
+// `t = a; a = b; b = t;` from this cell on. Cells of statements that went are empty.
 bool starts_swap(const LIST* s) {
     if (!s->rest || !s->rest->rest || !s->rest->rest->rest) return false;
     const NODE *save = s->first, *first = s->rest->first, *second = s->rest->rest->first;
+    if (!first || !second) return false;
     if (!is_float_copy(save) || !is_float_copy(first) || !is_float_copy(second)) return false;
     const SYMTAB *t = save->left->u.sym, *a = save->right->u.sym, *b = first->right->u.sym;
     return first->left->u.sym == a && second->left->u.sym == b && second->right->u.sym == t && t != a && t != b &&

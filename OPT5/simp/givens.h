@@ -36,7 +36,7 @@ void for_each_given(struct LOOP* loop, VISIT&& visit) {
             if (left-- > 0) visit_given(fact, true, MOST_FACT_LEVELS, visit);
     };
     if (loop_callbacks.givens)
-        for (; loop; loop = loop_callbacks.parent ? loop_callbacks.parent(loop) : nullptr)
+        for (; loop && left > 0; loop = loop_callbacks.parent ? loop_callbacks.parent(loop) : nullptr)
             visit_all(loop_callbacks.givens(loop));
     if (currfuninfo) visit_all(currfuninfo->givens);
 }

@@ -30,8 +30,25 @@ float kept(float a, float b) {
     return a * t;
 }
 
+// What stood between them goes first.
+// FUNCTION: no_exchange
+// COUNT 0: __swapf(
+// COUNT 0: unused = 
+float no_exchange(float a, float b, float c, int n) {
+    float t = 0, unused = a;
+    while (n-- > 0) {
+        show(t, b);
+        t = a;
+        unused = b;
+        b = t;
+        a = c;
+    }
+    return b;
+}
+
 int main(void) {
     for (int n = 0; n < 3; n++) exchanged(1.5F, -2.0F, n);
     put_f32(kept(3.0F, 4.0F));
+    put_f32(no_exchange(1.0F, 2.0F, 3.0F, 3));
     return 0;
 }

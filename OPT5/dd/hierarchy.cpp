@@ -1,12 +1,12 @@
 // The build of the loop hierarchy: shape, loops, symbols, variables, counts, and once more where a test was replicated.
 //
-// Needs: trees in normal form, alias marks. Leaves: a hierarchy, or none where the function can have none; block numbers.
-// Sound because the tree is made anew from the graph after every change of it, and what earlier passes promised of a loop is
-// taken into its record and put back in front of it.
+// Needs: trees in normal form, alias marks. Leaves: a hierarchy, or none where the function can have none; block
+// numbers. Sound because the tree is made anew from the graph after every change of it, and what earlier passes
+// promised of a loop is taken into its record and put back in front of it.
+#include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/dd/loop_shape.h"
-#include "OPT5/alias/alias.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
@@ -82,20 +82,36 @@ void copy_LOOPLV_list(const struct LOOP& from, struct LOOP& to) {
 
 // The pragma fields that hold one tree.
 constexpr NODE* LOOP::*PRAGMA_FIELDS[] = {
-    &LOOP::mustIterate,        &LOOP::probIterate,       &LOOP::unrollPragma,        &LOOP::unrollAmountPragma,
-    &LOOP::loopNoAliasPragma,  &LOOP::mmaLoopPragma,     &LOOP::sourceLoopPragma,    &LOOP::tripCntrMungedPragma,
-    &LOOP::noAliasClonePragma, &LOOP::loopFlagsPragma,   &LOOP::parallelLoopPragma,  &LOOP::coalesceLoopPragma,
-    &LOOP::noCoalesceLoopPragma, &LOOP::noNlcPragma,     &LOOP::spConstraintPragma,  &LOOP::iiEstimatePragma,
-    &LOOP::unitResourcesPragma, &LOOP::spHindrancesPragma, &LOOP::readWritePragma,
+    &LOOP::mustIterate,          &LOOP::probIterate,        &LOOP::unrollPragma,       &LOOP::unrollAmountPragma,
+    &LOOP::loopNoAliasPragma,    &LOOP::mmaLoopPragma,      &LOOP::sourceLoopPragma,   &LOOP::tripCntrMungedPragma,
+    &LOOP::noAliasClonePragma,   &LOOP::loopFlagsPragma,    &LOOP::parallelLoopPragma, &LOOP::coalesceLoopPragma,
+    &LOOP::noCoalesceLoopPragma, &LOOP::noNlcPragma,        &LOOP::spConstraintPragma, &LOOP::iiEstimatePragma,
+    &LOOP::unitResourcesPragma,  &LOOP::spHindrancesPragma, &LOOP::readWritePragma,
 };
 constexpr std::vector<NODE*> LOOP::*PRAGMA_LISTS[] = {&LOOP::noAliasAdvice, &LOOP::aliasAdvice, &LOOP::alignAdvice,
                                                       &LOOP::inlineAdvice};
 constexpr NODE* LOOP::*COUNT_FIELDS[] = {&LOOP::trips, &LOOP::tripFactor, &LOOP::maxTrips, &LOOP::minTrips};
 constexpr int32_t LOOP::*ESTIMATES[] = {
-    &LOOP::constraint_flags, &LOOP::unPartitionedII, &LOOP::partitionedII, &LOOP::resII,         &LOOP::recII,
-    &LOOP::minII,            &LOOP::estII,           &LOOP::LUnits,        &LOOP::SUnits,        &LOOP::MUnits,
-    &LOOP::DUnits,           &LOOP::addUnits,        &LOOP::logicalUnits,  &LOOP::reg_pressure,  &LOOP::predicatePressure,
-    &LOOP::live2longs,       &LOOP::interruptLimit,  &LOOP::Xpaths,        &LOOP::Tpaths,        &LOOP::longReads,
+    &LOOP::constraint_flags,
+    &LOOP::unPartitionedII,
+    &LOOP::partitionedII,
+    &LOOP::resII,
+    &LOOP::recII,
+    &LOOP::minII,
+    &LOOP::estII,
+    &LOOP::LUnits,
+    &LOOP::SUnits,
+    &LOOP::MUnits,
+    &LOOP::DUnits,
+    &LOOP::addUnits,
+    &LOOP::logicalUnits,
+    &LOOP::reg_pressure,
+    &LOOP::predicatePressure,
+    &LOOP::live2longs,
+    &LOOP::interruptLimit,
+    &LOOP::Xpaths,
+    &LOOP::Tpaths,
+    &LOOP::longReads,
     &LOOP::longWrites,
 };
 
@@ -159,7 +175,8 @@ bool LOOP::is_bottom_tested() const {
 std::vector<struct LOOP*> loops_outer_first(struct LOOP* root) {
     std::vector<struct LOOP*> loops;
     if (root) loops.push_back(root);
-    for (size_t i = 0; i < loops.size(); ++i) for_each_subloop(loops[i], [&](struct LOOP* inner) { loops.push_back(inner); });
+    for (size_t i = 0; i < loops.size(); ++i)
+        for_each_subloop(loops[i], [&](struct LOOP* inner) { loops.push_back(inner); });
     return loops;
 }
 
@@ -199,7 +216,9 @@ void sort_loop_contents_into_DFO(struct LOOP* loop) {
     std::sort(loop->exits.begin(), loop->exits.end(), by_number);
 }
 
-struct LOOP* loop_root() { return currfuninfo && currfuninfo->bb_list ? currfuninfo->bb_list->loop : nullptr; }
+struct LOOP* loop_root() {
+    return currfuninfo && currfuninfo->bb_list ? currfuninfo->bb_list->loop : nullptr;
+}
 
 struct LOOP* innermost_common_loop(struct LOOP* a, struct LOOP* b) {
     while (a && b && a != b) {
@@ -218,7 +237,8 @@ bool loop_is_subloop_of_loop(const struct LOOP* inner, const struct LOOP* outer,
 }
 
 bool loop_has_subloops(const struct LOOP* loop) {
-    return std::any_of(loop->contents.begin(), loop->contents.end(), [loop](const BBLK* bb) { return bb->loop != loop; });
+    return std::any_of(loop->contents.begin(), loop->contents.end(),
+                       [loop](const BBLK* bb) { return bb->loop != loop; });
 }
 
 bool bb_dominates_bb(BBLK* a, BBLK* b) {
@@ -241,7 +261,9 @@ void hold(std::unique_ptr<HIERARCHY> made) {
     currfuninfo->hierarchy = made.release();
 }
 
-bool is_back_edge(const BBLK* from, const BBLK* to) { return to->loop && to->loop->head == to && to->loop->tail == from && !to->loop->is_root(); }
+bool is_back_edge(const BBLK* from, const BBLK* to) {
+    return to->loop && to->loop->head == to && to->loop->tail == from && !to->loop->is_root();
+}
 void edge_was_split(BBLK* from, BBLK* middle, BBLK* to) {
     struct LOOP* loop = innermost_common_loop(from->loop, to->loop);
     middle->loop = loop;
@@ -346,8 +368,8 @@ void build_minimal_loop_hierarchy(bool requireLoops) {
 namespace {
 
 bool lies_within(const SOURCE_PLACE& place, const struct LOOP* loop) {
-    return place.line && loop->sourceStart.line && place.file == loop->sourceStart.file && place.line >= loop->sourceStart.line &&
-           place.line <= loop->sourceEnd.line;
+    return place.line && loop->sourceStart.line && place.file == loop->sourceStart.file &&
+           place.line >= loop->sourceStart.line && place.line <= loop->sourceEnd.line;
 }
 
 struct LOOP* find_clone(struct LOOP* of, uint32_t flag) {
@@ -385,7 +407,8 @@ void rebind_reflection(struct LOOP* loop) {
 } // namespace
 
 void rebind_clones(struct LOOP* root) {
-    constexpr uint32_t ANY = LOOP_favored | LOOP_deprecated | LOOP_unaliased | LOOP_aligned | LOOP_has_trip_predicate | LOOP_conservative;
+    constexpr uint32_t ANY =
+        LOOP_favored | LOOP_deprecated | LOOP_unaliased | LOOP_aligned | LOOP_has_trip_predicate | LOOP_conservative;
     for (struct LOOP* loop : loops_outer_first(root)) {
         if (!loop->has(ANY)) continue;
         rebind_counterpart(loop, LOOP_favored, LOOP_deprecated);

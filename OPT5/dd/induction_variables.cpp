@@ -1,8 +1,8 @@
 // Induction variables of the hierarchy's loops, their increments, and the variable that controls a loop.
 //
-// A variable counts here if every assignment of it in the loop adds an invariant to it, in the loop's head or tail, which
-// each iteration executes once. The search asks the region constants as they stood before: whatever the loop assigns is
-// still in the set of altered symbols.
+// A variable counts here if every assignment of it in the loop adds an invariant to it, in the loop's head or tail,
+// which each iteration executes once. The search asks the region constants as they stood before: whatever the loop
+// assigns is still in the set of altered symbols.
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
 
@@ -29,7 +29,8 @@ namespace {
 bool counts(const TYPE* type) { return (type->is_int() && !type->is_bool()) || type->is_pointer(); }
 
 const NODE* without_widening(const NODE* t) {
-    while (t->op == SCONV && t->left->type->is_int() && t->type->is_int() && t->type->size >= t->left->type->size) t = t->left;
+    while (t->op == SCONV && t->left->type->is_int() && t->type->is_int() && t->type->size >= t->left->type->size)
+        t = t->left;
     return t;
 }
 
@@ -49,7 +50,8 @@ bool is_compound_update(const NODE* t, INDUCTION_UPDATE* u) {
         u->computed = type;
         return true;
     }
-    u->computed = t->op == PLUSPLUS || t->op == MINMIN || t->right->op == ICON ? type : combined_type(t->left, t->right);
+    u->computed =
+        t->op == PLUSPLUS || t->op == MINMIN || t->right->op == ICON ? type : combined_type(t->left, t->right);
     u->is_narrowed = !is_own_type(u->computed, type);
     return true;
 }
@@ -89,7 +91,8 @@ bool is_induction_update(const NODE* t, INDUCTION_UPDATE* u) {
     case MINUSASG: is_update = is_compound_update(t, u); break;
     case ASG: is_update = is_assigned_sum(t, u); break;
     }
-    return is_update && u->amount->type->is_int() && !u->amount->type->is_bool() && !sym_appears_in_tree(u->sym, u->amount);
+    return is_update && u->amount->type->is_int() && !u->amount->type->is_bool() &&
+           !sym_appears_in_tree(u->sym, u->amount);
 }
 
 // ---- Candidates
@@ -103,18 +106,20 @@ bool reads_memory(const NODE* t) {
 bool may_be_IV(const INDUCTION_UPDATE& u, const struct LOOP* loop) {
     const SYMTAB* sym = u.sym;
     return !sym->is_aliased() && !sym->type->is_volatile() && !symbol_is_immutable(sym) &&
-           !(loop->has(LOOP_has_call) && sym->level == 0) && !reads_memory(u.amount) && tree_is_RC_in_loop(u.amount, loop, false);
+           !(loop->has(LOOP_has_call) && sym->level == 0) && !reads_memory(u.amount) &&
+           tree_is_RC_in_loop(u.amount, loop, false);
 }
 
-// Whether exactly one of the block's two arms is executed in each iteration, and neither the arms nor the tail touch the
-// symbol: control leads from the block to the tail past at most one block.
+// Whether exactly one of the block's two arms is executed in each iteration, and neither the arms nor the tail touch
+// the symbol: control leads from the block to the tail past at most one block.
 bool passes_diamond_test(const BBLK* bb, const struct LOOP* loop, const NODE* lvalue) {
     const BBLK* tail = loop->tail;
     if (edge_length(bb->successors) != 2 || edge_length(tail->predecessors) != 2) return false;
     for (const EDGE* e = bb->successors; e; e = e->rest) {
         const BBLK* arm = e->first;
         if (arm == tail) continue;
-        if (edge_length(arm->predecessors) != 1 || edge_length(arm->successors) != 1 || arm->successors->first != tail) return false;
+        if (edge_length(arm->predecessors) != 1 || edge_length(arm->successors) != 1 || arm->successors->first != tail)
+            return false;
         if (sym_appears_in_bb(lvalue->u.sym, arm)) return false;
     }
     return bb->successors->first != bb->successors->rest->first && !bb_modifies_lvalue_in_tree(tail, lvalue);
@@ -122,7 +127,8 @@ bool passes_diamond_test(const BBLK* bb, const struct LOOP* loop, const NODE* lv
 
 bool is_update_block(const BBLK* bb, const struct LOOP* loop, const INDUCTION_UPDATE& u, const NODE* statement) {
     if (bb == loop->head || bb == loop->tail) return true;
-    return do_dd_for_be && u.sym->type->is_pointer() && statement->op != ASG && passes_diamond_test(bb, loop, statement->left);
+    return do_dd_for_be && u.sym->type->is_pointer() && statement->op != ASG &&
+           passes_diamond_test(bb, loop, statement->left);
 }
 
 class CANDIDATES {
@@ -130,7 +136,8 @@ public:
     explicit CANDIDATES(struct LOOP* of) : loop(of) {}
     void find() {
         SYM_SET altered;
-        for_each_subloop(loop, [&altered](struct LOOP* inner) { altered.insert(inner->ALT_syms.begin(), inner->ALT_syms.end()); });
+        for_each_subloop(
+            loop, [&altered](struct LOOP* inner) { altered.insert(inner->ALT_syms.begin(), inner->ALT_syms.end()); });
         const NODE* first = currfuninfo->bb_list->statements->first;
         for (BBLK* bb : loop->contents)
             if (bb->loop == loop)
@@ -167,8 +174,10 @@ public:
     INCREMENT(LOOPIV* of, struct LOOP* in) : iv(of), loop(in) {}
     void accumulate() {
         add_updates_of(loop->head, IV_updated_in_head);
-        if (loop->tail != loop->head) add_updates_of(loop->tail, IV_updated_in_tail);
-        else iv->flags |= IV_updated_in_tail;
+        if (loop->tail != loop->head)
+            add_updates_of(loop->tail, IV_updated_in_tail);
+        else
+            iv->flags |= IV_updated_in_tail;
         if (do_dd_for_be && iv->sym->type->is_pointer())
             for (BBLK* bb : loop->contents)
                 if (bb->loop == loop && bb != loop->head && bb != loop->tail) add_updates_of(bb, IV_updated_in_tail);
@@ -199,16 +208,17 @@ private:
     }
     void enter_direction(const INDUCTION_UPDATE& u) {
         const int sign = u.amount->op == ICON && amount_of(u).sign < 0 ? -1
-                         : u.amount->op == ICON                       ? (amount_of(u) == INT65(0) ? 0 : 1)
-                         : tree_is_positive(u.amount, loop)           ? (u.is_subtracted ? -1 : 1)
-                         : tree_is_negative(u.amount, loop)           ? (u.is_subtracted ? 1 : -1)
-                                                                      : 0;
+                         : u.amount->op == ICON                        ? (amount_of(u) == INT65(0) ? 0 : 1)
+                         : tree_is_positive(u.amount, loop)            ? (u.is_subtracted ? -1 : 1)
+                         : tree_is_negative(u.amount, loop)            ? (u.is_subtracted ? 1 : -1)
+                                                                       : 0;
         iv->flags |= sign > 0 ? IV_increases : sign < 0 ? IV_decreases : (IV_increases | IV_decreases);
     }
     // The signed number that a constant update adds.
     INT65 amount_of(const INDUCTION_UPDATE& u) const {
         INT65 v = u.amount->u.lval;
-        if (!iv->sym->type->is_pointer() && iv->sym->type->is_unsigned()) v = sign_extend_by_type_size(v, iv->sym->type);
+        if (!iv->sym->type->is_pointer() && iv->sym->type->is_unsigned())
+            v = sign_extend_by_type_size(v, iv->sym->type);
         return u.is_subtracted ? -v : v;
     }
     void add(const INDUCTION_UPDATE& u) {
@@ -224,7 +234,8 @@ private:
             }
             iv->incrtree = mk_ICON(constant, type);
         }
-        iv->incrtree = made_exact(u.is_subtracted ? MINUS : PLUS, iv->incrtree, coerce_to_type(type, copy_tree(u.amount)), type, loop);
+        iv->incrtree = made_exact(u.is_subtracted ? MINUS : PLUS, iv->incrtree,
+                                  coerce_to_type(type, copy_tree(u.amount)), type, loop);
     }
 
     LOOPIV* iv;
@@ -236,7 +247,8 @@ constexpr int SEARCH_BUDGET = 100000, SEARCH_DEPTH = 10;
 
 NODE* value_on_entry(SYMTAB* sym, struct LOOP* loop, size_t symbols) {
     if (!loop->preheader) return nullptr;
-    NODE* value = find_symbol_value(sym, loop->preheader, loop, SEARCH_BUDGET / static_cast<int>(symbols), SEARCH_DEPTH);
+    NODE* value =
+        find_symbol_value(sym, loop->preheader, loop, SEARCH_BUDGET / static_cast<int>(symbols), SEARCH_DEPTH);
     if (value && sym_appears_in_tree(sym, value)) {
         erase_tree(value);
         value = nullptr;
@@ -332,7 +344,8 @@ private:
     static const NODE* variable_of_test(const NODE* condition) {
         if (!op_is_int_compare(condition->op)) return condition->op == NAME ? condition : nullptr;
         const NODE* t = condition->left;
-        while (t->op == SCONV && t->left->type->is_int() && t->left->type->is_unsigned() && t->type->size == t->left->type->size)
+        while (t->op == SCONV && t->left->type->is_int() && t->left->type->is_unsigned() &&
+               t->type->size == t->left->type->size)
             t = t->left;
         return t->op == NAME ? t : nullptr;
     }
@@ -353,7 +366,8 @@ namespace {
 // The condition of the loop's exit test as a new tree that is true where control stays, or null.
 NODE* staying_condition(const BBLK* bb, const struct LOOP* loop) {
     const NODE* branch = bb->branch();
-    if (!branch || branch->op != IF || branch->left->op == ENDLOOP || tree_has_side_effects(branch->left)) return nullptr;
+    if (!branch || branch->op != IF || branch->left->op == ENDLOOP || tree_has_side_effects(branch->left))
+        return nullptr;
     const BBLK *yes = branch->right->left->lbl->bblock, *no = branch->right->right->lbl->bblock;
     auto stays = [loop](const BBLK* b) { return loop_is_subloop_of_loop(b->loop, loop, true); };
     if (stays(yes) == stays(no)) return nullptr;
@@ -366,7 +380,8 @@ NODE* staying_condition(const BBLK* bb, const struct LOOP* loop) {
     else if (condition->op == NAME && counts(condition->type)) {
         t = new_node(NEQ, tp->int_t);
         t->left = copy_tree(condition);
-        t->right = coerce_to_type(condition->type, mk_ICON(INT65(0), condition->type->is_pointer() ? tp->long_t : condition->type));
+        t->right = coerce_to_type(condition->type,
+                                  mk_ICON(INT65(0), condition->type->is_pointer() ? tp->long_t : condition->type));
     } else
         return nullptr;
     if (!holds) {
@@ -417,8 +432,8 @@ NODE* find_loop_predicate(struct LOOP* loop) {
     return t;
 }
 
-// `LCV test last` is asked behind the updates of the iteration where the loop is bottom-tested, and ahead of them where it
-// is top-tested.
+// `LCV test last` is asked behind the updates of the iteration where the loop is bottom-tested, and ahead of them where
+// it is top-tested.
 bool find_loop_LCV(struct LOOP* loop) {
     loop->LCV = nullptr;
     loop->test = ILLOP;
@@ -449,7 +464,8 @@ TYPE* arithmetic_type(const LOOPIV* iv) { return iv->sym->type->is_pointer() ? t
 // `start` plus a multiple of the step, in the variable's type; both trees are consumed.
 NODE* stepped(const LOOPIV* iv, NODE* start, NODE* times, struct LOOP* loop) {
     TYPE* type = arithmetic_type(iv);
-    NODE* distance = made_exact(MULT, coerce_to_type(type, times), coerce_to_type(type, copy_tree(iv->incrtree)), type, loop);
+    NODE* distance =
+        made_exact(MULT, coerce_to_type(type, times), coerce_to_type(type, copy_tree(iv->incrtree)), type, loop);
     if (iv->sym->type->is_pointer()) return simp_node(maketree(PLUS, start, distance, start->type), loop);
     return made_exact(PLUS, coerce_to_type(type, start), distance, type, loop);
 }
@@ -466,7 +482,9 @@ NODE* less_one(const NODE* trips, struct LOOP* loop) {
 } // namespace
 
 void compute_lasttree_for_IV(LOOPIV* iv, struct LOOP* loop) {
-    if (!loop->trips || !iv->incrtree || !iv->init || iv->last || !iv->has(IV_affine) || !iv->has(IV_increases | IV_decreases)) return;
+    if (!loop->trips || !iv->incrtree || !iv->init || iv->last || !iv->has(IV_affine) ||
+        !iv->has(IV_increases | IV_decreases))
+        return;
     if (loop->trips->type->size > arithmetic_type(iv)->size && loop->trips->op != ICON) return;
     iv->last = stepped(iv, copy_tree(iv->init), less_one(loop->trips, loop), loop);
     if (!iv->sym->type->is_int() || !iv->sym->type->is_signed() || !loop->trips) return;
@@ -512,7 +530,8 @@ NODE* eval_expr_for_iteration(const NODE* expr, struct LOOP* loop, int which) {
 
 NODE* eval_expr_for_2nd_iteration(const NODE* expr, struct LOOP* loop) {
     return evaluated(expr, loop, [loop](const LOOPIV* iv) -> NODE* {
-        return iv->init && iv->incrtree ? stepped(iv, copy_tree(iv->init), mk_ICON(INT65(1), arithmetic_type(iv)), loop) : nullptr;
+        return iv->init && iv->incrtree ? stepped(iv, copy_tree(iv->init), mk_ICON(INT65(1), arithmetic_type(iv)), loop)
+                                        : nullptr;
     });
 }
 

@@ -5,10 +5,12 @@
 //
 // Needs: loops and alias marks; no saved environment. Leaves: those, with new statements in preheaders.
 // Sound because what moves cannot fail and has no effect: no division, no load but of a variable that nothing in the
-// loop may write to. It may be computed where it was not before: a signed sum or product that need not be exact there is
-// computed in the unsigned type.
+// loop may write to. It may be computed where it was not before: a signed sum or product that need not be exact there
+// is computed in the unsigned type.
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
+#include "OPT5/dd/inductions.h"
+#include "OPT5/dd/merge.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -17,8 +19,6 @@
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
-#include "OPT5/dd/inductions.h"
-#include "OPT5/dd/merge.h"
 #include "OPT5/simp/exact.h"
 
 #include <algorithm>
@@ -47,7 +47,9 @@ int cost_of(const NODE* t) {
     return cost;
 }
 
-bool is_plain(const TYPE* t) { return ((t->is_int() && !t->is_bool()) || t->is_float() || t->is_pointer()) && !t->is_complex(); }
+bool is_plain(const TYPE* t) {
+    return ((t->is_int() && !t->is_bool()) || t->is_float() || t->is_pointer()) && !t->is_complex();
+}
 
 class INVARIANTS {
 public:
@@ -62,7 +64,8 @@ public:
             for (LIST* s = bb->statements; s; s = s->rest) statement(s->first);
         }
         if (found.empty()) return;
-        std::stable_sort(found.begin(), found.end(), [](const CANDIDATE& a, const CANDIDATE& b) { return a.gain > b.gain; });
+        std::stable_sort(found.begin(), found.end(),
+                         [](const CANDIDATE& a, const CANDIDATE& b) { return a.gain > b.gain; });
         hoist();
     }
 
@@ -75,7 +78,8 @@ private:
                 if (s->first->op == ASM || tree_is_EH_SWITCH(s->first)) return false;
                 for_each_written_name(s->first, [this](const NODE* name, const NODE*) { written.insert(name->u.sym); });
                 for_each_node(s->first, [this](const NODE* n) {
-                    if (n->op == NAME && n->u.sym && n->type->is_pointer() && n->u.sym->level > 0) pointers.insert(n->u.sym);
+                    if (n->op == NAME && n->u.sym && n->type->is_pointer() && n->u.sym->level > 0)
+                        pointers.insert(n->u.sym);
                 });
             }
         }
@@ -162,7 +166,8 @@ private:
         NODE* t = *place;
         CANDIDATE* c = nullptr;
         for (CANDIDATE& other : found)
-            if (equiv_mtypes((*other.uses.front())->type, t->type) && trees_are_congruent(*other.uses.front(), t, false))
+            if (equiv_mtypes((*other.uses.front())->type, t->type) &&
+                trees_are_congruent(*other.uses.front(), t, false))
                 c = &other;
         if (!c) {
             if (found.size() == MOST_CANDIDATES) return false;
@@ -208,15 +213,16 @@ private:
             if (old != value) erase_tree(old);
         }
         if (!c.is_certain)
-            value = rewrite_tree(value, [](NODE* t) { return is_exact_by_rule(t->op, t->type) ? kept_exact(t, nullptr) : t; });
+            value = rewrite_tree(value,
+                                 [](NODE* t) { return is_exact_by_rule(t->op, t->type) ? kept_exact(t, nullptr) : t; });
         insert_at_end_of_body(ahead, mk_ASG(mk_NAME(variable), coerce_to_type(type, value)));
         return variable;
     }
 
     NATURAL_LOOPS& loops;
     NATURAL_LOOP* loop;
-    std::unordered_set<const SYMTAB*> written, pointers;  // looked up only
-    std::unordered_map<const SYMTAB*, bool> unchanged;    // other variables that were asked about
+    std::unordered_set<const SYMTAB*> written, pointers; // looked up only
+    std::unordered_map<const SYMTAB*, bool> unchanged;   // other variables that were asked about
     std::vector<CANDIDATE> found;
     int questions = 0;
     double weight = 1;

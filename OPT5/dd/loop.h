@@ -1,17 +1,18 @@
 // The loop hierarchy: the tree of natural loops of the current function, and what is known of each.
 //
-// It hangs off the first block: the root stands for the function's body, every other LOOP for one natural loop, which has
-// one preheader, one latch and exit blocks of its own. `build_loop_hierarchy` makes it, on trees in normal form; it is made
-// anew where the graph has changed, never patched, and gone before blocks are simplified.
+// It hangs off the first block: the root stands for the function's body, every other LOOP for one natural loop, which
+// has one preheader, one latch and exit blocks of its own. `build_loop_hierarchy` makes it, on trees in normal form; it
+// is made anew where the graph has changed, never patched, and gone before blocks are simplified.
 //
-//     hierarchy.cpp        the build, shape of the graph, discovery, preheaders, exits      while_tests.cpp   replicated tests
-//     loop_symbols.cpp     invariants, and the questions about them                         value_search.cpp  values on entry
-//     induction_variables.cpp   candidates, increments, the control variable                loop_bounds.cpp   ranges of variables
-//     trip_count.cpp, trip_bounds.cpp   affine variables, counts and what is known of them  loop_pragmas.cpp  promises in and out
-//     loop_assertions.cpp  facts that hold in a loop                                        loop_variables.cpp   other scalars
+//     hierarchy.cpp        the build, shape of the graph, discovery, preheaders, exits      while_tests.cpp replicated
+//     tests loop_symbols.cpp     invariants, and the questions about them                         value_search.cpp
+//     values on entry induction_variables.cpp   candidates, increments, the control variable loop_bounds.cpp   ranges
+//     of variables trip_count.cpp, trip_bounds.cpp   affine variables, counts and what is known of them
+//     loop_pragmas.cpp  promises in and out loop_assertions.cpp  facts that hold in a loop loop_variables.cpp   other
+//     scalars
 //
-// Trees that a record holds are owned by it; trees that an operation takes are borrowed unless it says so. Every question
-// answers "no", null or ILLOP where it cannot be decided.
+// Trees that a record holds are owned by it; trees that an operation takes are borrowed unless it says so. Every
+// question answers "no", null or ILLOP where it cannot be decided.
 #pragma once
 
 #include "OPT5/ir/bblk.h"
@@ -68,8 +69,8 @@ struct LOOPIV {
     std::vector<NODE*> entryGivens; // conditions on the value on entry
     NODE* norm = nullptr;
     NODE *ssa_norm = nullptr, *ssa_init = nullptr, *ssa_incr = nullptr; // in SSA form, not built yet
-    NODE* init = nullptr;     // on entry; null: not known
-    NODE* last = nullptr;     // in the last iteration; of the control variable before the count is known: the limit it is tested against
+    NODE* init = nullptr; // on entry; null: not known
+    NODE* last = nullptr; // in the last iteration; the control variable's is the limit that it is tested against
     NODE* incrtree = nullptr; // by iteration
     NODE* virtualInit = nullptr;
     INT65 highval, lowval; // bounds of the value
@@ -135,8 +136,8 @@ struct LOOP {
     SYM_SET RC_syms;      // read and not changed in the loop, of no loop around it
     SYM_SET ALT_syms;     // changed
     std::vector<SYMTAB*> IV_syms;
-    LOOPIV* LCV = nullptr;  // of `IVs`
-    LOOPIV* VLCV = nullptr; // of `IVs`: the count of iterations from 0
+    LOOPIV* LCV = nullptr;                  // of `IVs`
+    LOOPIV* VLCV = nullptr;                 // of `IVs`: the count of iterations from 0
     std::shared_ptr<SYMTAB> virtual_symbol; // its, on no list of the function
     std::vector<std::unique_ptr<LOOPIV>> IVs;
     std::unordered_map<const SYMTAB*, LOOPIV*> record_of; // those of `IVs`; looked up alone
@@ -147,7 +148,8 @@ struct LOOP {
     NODE *mustIterate = nullptr, *probIterate = nullptr, *unrollPragma = nullptr, *unrollAmountPragma = nullptr;
     NODE *loopNoAliasPragma = nullptr, *mmaLoopPragma = nullptr, *sourceLoopPragma = nullptr;
     NODE *tripCntrMungedPragma = nullptr, *noAliasClonePragma = nullptr, *loopFlagsPragma = nullptr;
-    NODE *parallelLoopPragma = nullptr, *coalesceLoopPragma = nullptr, *noCoalesceLoopPragma = nullptr, *noNlcPragma = nullptr;
+    NODE *parallelLoopPragma = nullptr, *coalesceLoopPragma = nullptr, *noCoalesceLoopPragma = nullptr,
+         *noNlcPragma = nullptr;
     NODE *spConstraintPragma = nullptr, *iiEstimatePragma = nullptr, *unitResourcesPragma = nullptr;
     NODE *spHindrancesPragma = nullptr, *readWritePragma = nullptr;
     std::vector<NODE*> noAliasAdvice, aliasAdvice, alignAdvice, inlineAdvice;
@@ -179,8 +181,9 @@ void for_each_subloop(const struct LOOP* l, F&& visit); // those directly in it,
 
 // ---- hierarchy.cpp
 
-// `full`: with replication of tests and ranges by subscripts; `scalars`: with forwarding in loops; `simplify`: loops that
-// can be decided fold. `requireLoops` nonzero: a function without back edges gets no hierarchy; below 0: as `full`.
+// `full`: with replication of tests and ranges by subscripts; `scalars`: with forwarding in loops; `simplify`: loops
+// that can be decided fold. `requireLoops` nonzero: a function without back edges gets no hierarchy; below 0: as
+// `full`.
 void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoops);
 // What the build calls of the rooms above; null until they are there.
 struct LOOP_WORK {
@@ -220,7 +223,8 @@ void find_region_constants(struct LOOP* loop);
 bool sym_is_RC_in_loop(const SYMTAB* sym, const struct LOOP* loop);
 // With `lcvCounts` the loop's control variables count as invariant.
 bool tree_is_RC_in_loop(const NODE* tree, const struct LOOP* loop, bool lcvCounts);
-int expr_is_affine_in_loop(const NODE* tree, const struct LOOP* loop, bool strict); // -1 invariant, 1 of the control variable, 0 neither
+int expr_is_affine_in_loop(const NODE* tree, const struct LOOP* loop,
+                           bool strict); // -1 invariant, 1 of the control variable, 0 neither
 bool subscript_is_linear(const NODE* tree, struct LOOP* loop, bool onlyVLCV, DDEP* dep);
 void make_sym_RC_in_loop(SYMTAB* sym, struct LOOP* loop);
 void make_sym_altered_in_loop(SYMTAB* sym, struct LOOP* loop);
@@ -228,43 +232,46 @@ LOOPIV* alloc_LOOPIV(SYMTAB* sym, struct LOOP* loop); // at the end of the loop'
 void delete_LOOPIV(LOOPIV* iv);
 LOOPIV* find_LOOPIV_for_IV(const SYMTAB* sym, const struct LOOP* loop, bool outer_too);
 LOOPLV* find_LOOPLV_for_LV(const SYMTAB* sym, struct LOOP* loop);
-struct LOOP* find_loop_for_LCV(const SYMTAB* sym, struct LOOP* loop); // the loop around or `loop` whose control variable it is
+struct LOOP* find_loop_for_LCV(const SYMTAB* sym,
+                               struct LOOP* loop); // the loop around or `loop` whose control variable it is
 LOOPIV* find_LCV_for_loop(const struct LOOP* loop, uint64_t flags); // the record with one of the flags, or null
 SYMTAB* object_name_if_known(const NODE* tree, bool, bool);
 
 // ---- induction_variables.cpp
 
-// A statement that adds an amount to a variable: x = x + e, x = e + x, x = x - e, x += e, x -= e, ++, --, and the same under
-// a conversion to the variable's type. This is the one place that says what an update is.
+// A statement that adds an amount to a variable: x = x + e, x = e + x, x = x - e, x += e, x -= e, ++, --, and the same
+// under a conversion to the variable's type. This is the one place that says what an update is.
 struct INDUCTION_UPDATE {
     SYMTAB* sym = nullptr;
     const NODE* amount = nullptr; // a part of the statement
     bool is_subtracted = false;
-    bool is_narrowed = false;        // the sum is computed in another integer type and converted
+    bool is_narrowed = false;       // the sum is computed in another integer type and converted
     const TYPE* computed = nullptr; // the type that the sum is computed in
 };
 bool is_induction_update(const NODE* statement, INDUCTION_UPDATE* update);
 
 void find_loop_IVs(struct LOOP* loop);
-bool find_loop_LCV(struct LOOP* loop);         // whether one was proved
-NODE* find_loop_predicate(struct LOOP* loop);  // a new tree: control stays in the loop while it holds; normalized; or null
+bool find_loop_LCV(struct LOOP* loop); // whether one was proved
+NODE* find_loop_predicate(
+    struct LOOP* loop); // a new tree: control stays in the loop while it holds; normalized; or null
 void compute_lasttree_for_IV(LOOPIV* iv, struct LOOP* loop);
 void make_virtual_LCV(struct LOOP* loop);
 void erase_virtual_inits(struct LOOP* root);
-NODE* eval_expr_for_iteration(const NODE* expr, struct LOOP* loop, int which); // 0: the last, otherwise the first; new, or null
+NODE* eval_expr_for_iteration(const NODE* expr, struct LOOP* loop,
+                              int which); // 0: the last, otherwise the first; new, or null
 NODE* eval_expr_for_2nd_iteration(const NODE* expr, struct LOOP* loop);
 
 // ---- value_search.cpp
 
-// What the symbol holds at the end of the block, as a new tree of values that hold there too, or null. `budget`: statements
-// looked at; `depth`: definitions looked through.
+// What the symbol holds at the end of the block, as a new tree of values that hold there too, or null. `budget`:
+// statements looked at; `depth`: definitions looked through.
 NODE* find_symbol_value(SYMTAB* sym, BBLK* at_end_of, struct LOOP* loop, int budget, int depth);
-// What the search finds out of the function is kept from one question to the next between `keep_symbol_values(true)` and
-// (false); whoever changes statements or blocks in between says so.
+// What the search finds out of the function is kept from one question to the next between `keep_symbol_values(true)`
+// and (false); whoever changes statements or blocks in between says so.
 void keep_symbol_values(bool keep);
 void forget_symbol_values();
 NODE* find_expr_init(const NODE* expr, struct LOOP* loop); // a new tree, in values at the end of the loop's preheader
-BBLK* find_dominator_bb(BBLK* bb); // the block looked at before `bb`, or null; over whole loops
+BBLK* find_dominator_bb(BBLK* bb);                         // the block looked at before `bb`, or null; over whole loops
 BBLK* find_dominator_bb_for_sym(BBLK* bb, SYMTAB* sym, INT65* adjustment);
 
 // ---- while_tests.cpp
@@ -306,7 +313,7 @@ void add_loop_body_assertion(NODE* tree, struct LOOP* loop);
 // ---- loop_pragmas.cpp
 // Arguments are decimal text; one that is not there, or is no number, counts as absent.
 NODE* set_PPRAGMA_tree_info(NODE* tree, int number, const std::vector<std::string>& args); // null: a new one
-std::string get_PPRAGMA_tree_arg(const NODE* tree, int n); // empty where it has none
+std::string get_PPRAGMA_tree_arg(const NODE* tree, int n);                                 // empty where it has none
 void set_PPRAGMA_tree_arg(NODE* tree, int n, const std::string& text);
 INT65 get_PPRAGMA_tree_int_arg(const NODE* tree, int n, INT65 absent = INT65(0));
 void set_PPRAGMA_tree_int_arg(NODE* tree, int n, INT65 value);

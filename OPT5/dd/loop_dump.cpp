@@ -15,9 +15,12 @@
 
 namespace {
 
-std::string indent_of(const struct LOOP* loop) { return std::string(static_cast<size_t>(std::min<int>(loop->level, 20)) * 2 + 2, ' '); }
+std::string indent_of(const struct LOOP* loop) {
+    return std::string(static_cast<size_t>(std::min<int>(loop->level, 20)) * 2 + 2, ' ');
+}
 
-void dump_blocks(const char* label, const std::vector<BBLK*>& blocks, const struct LOOP* loop, const std::string& indent) {
+void dump_blocks(const char* label, const std::vector<BBLK*>& blocks, const struct LOOP* loop,
+                 const std::string& indent) {
     debug_printf("%s%s:", indent.c_str(), label);
     for (const BBLK* bb : blocks) debug_printf(" %d", loop && bb->loop != loop ? -bb->dfn : bb->dfn);
     debug_printf("\n");
@@ -40,19 +43,22 @@ void dump_record(const LOOPIV& iv, const std::string& indent) {
     if (iv.has(IV_is_ULCV)) debug_printf(" (ULCV)");
     if (iv.has(IV_is_IV) && !iv.has(IV_affine)) debug_printf(" **NOT AFFINE**");
     if (iv.has(IV_dead_on_exit)) debug_printf(" (dead on exit)");
-    for (auto [label, t] : {std::make_pair("init", iv.init), std::make_pair("last", iv.last), std::make_pair("incr", iv.incrtree)})
+    for (auto [label, t] :
+         {std::make_pair("init", iv.init), std::make_pair("last", iv.last), std::make_pair("incr", iv.incrtree)})
         if (t) debug_printf("  %s=%s", label, tree_to_infix(t).c_str());
     debug_printf("  [%s, %s]\n", int2text(iv.lowval, tp->llong_t, 10, 0), int2text(iv.highval, tp->ullong_t, 10, 1));
 }
 
 void dump_place(const char* label, const SOURCE_PLACE& place, const std::string& indent) {
-    if (place.line) debug_printf("%s%s %s:%ld\n", indent.c_str(), label, place.file.c_str(), static_cast<long>(place.line));
+    if (place.line)
+        debug_printf("%s%s %s:%ld\n", indent.c_str(), label, place.file.c_str(), static_cast<long>(place.line));
 }
 
 void dump_loop(const struct LOOP* loop) {
     const std::string indent = indent_of(loop);
-    debug_printf("\n%sLOOP #%d level %d head BB%d tail BB%d preheader BB%d flags x%x", indent.c_str() + 2, loop->uid, loop->level,
-                 loop->head->dfn, loop->tail ? loop->tail->dfn : 0, loop->preheader ? loop->preheader->dfn : 0, loop->flags);
+    debug_printf("\n%sLOOP #%d level %d head BB%d tail BB%d preheader BB%d flags x%x", indent.c_str() + 2, loop->uid,
+                 loop->level, loop->head->dfn, loop->tail ? loop->tail->dfn : 0,
+                 loop->preheader ? loop->preheader->dfn : 0, loop->flags);
     if (loop->has(LOOP_early_exit)) debug_printf("  *EARLY EXIT*");
     if (loop->has(LOOP_conservative)) debug_printf(" | LOOP IS conservatively aligned and/or aliased");
     if (loop->has(LOOP_has_trip_predicate)) debug_printf(" | LOOP HAS TRIPCOUNT PRED");
@@ -67,7 +73,8 @@ void dump_loop(const struct LOOP* loop) {
     dump_symbols("ALT", loop->ALT_syms, indent);
     for (const auto& iv : loop->IVs) dump_record(*iv, indent);
     for (const LOOPLV& lv : loop->LVs)
-        debug_printf("%sLV %s defs=%d/%d uses=%d/%d flags x%x\n", indent.c_str(), lv.sym->name, lv.usingDefs, lv.defs, lv.derefUses, lv.uses, lv.flags);
+        debug_printf("%sLV %s defs=%d/%d uses=%d/%d flags x%x\n", indent.c_str(), lv.sym->name, lv.usingDefs, lv.defs,
+                     lv.derefUses, lv.uses, lv.flags);
     dump_tree("trips", loop->trips, indent);
     dump_tree("max factor", loop->tripFactor, indent);
     dump_tree("maxval", loop->maxTrips, indent);
@@ -105,8 +112,12 @@ private:
         expect(loop->is_root() || loop->uid > loop->parent->uid, loop, "number");
     }
     void check_blocks(const struct LOOP* loop) {
-        for (const BBLK* bb : loop->contents) expect(bb->loop == loop || (bb->loop && bb->loop->parent == loop && bb->loop->head == bb), loop, "contents");
-        expect(std::is_sorted(loop->contents.begin(), loop->contents.end(), [](const BBLK* a, const BBLK* b) { return a->dfn < b->dfn; }), loop, "order of contents");
+        for (const BBLK* bb : loop->contents)
+            expect(bb->loop == loop || (bb->loop && bb->loop->parent == loop && bb->loop->head == bb), loop,
+                   "contents");
+        expect(std::is_sorted(loop->contents.begin(), loop->contents.end(),
+                              [](const BBLK* a, const BBLK* b) { return a->dfn < b->dfn; }),
+               loop, "order of contents");
         for (const BBLK* exit : loop->exits) {
             expect(!loop_is_subloop_of_loop(exit->loop, loop, true), loop, "an exit lies inside");
             for (const EDGE* e = exit->predecessors; e; e = e->rest)
@@ -115,18 +126,24 @@ private:
     }
     void check_shape(const struct LOOP* loop) {
         const NATURAL_LOOP* natural = currfuninfo->loops->around(loop->head);
-        expect(natural && natural->header == loop->head && natural->latches.size() == 1 && natural->latches.front() == loop->tail, loop,
-               "no natural loop with that head and tail");
+        expect(natural && natural->header == loop->head && natural->latches.size() == 1 &&
+                   natural->latches.front() == loop->tail,
+               loop, "no natural loop with that head and tail");
         const BBLK* pre = loop->preheader;
-        expect(pre && pre->loop == loop->parent && pre->successors && !pre->successors->rest && pre->successors->first == loop->head, loop, "preheader");
+        expect(pre && pre->loop == loop->parent && pre->successors && !pre->successors->rest &&
+                   pre->successors->first == loop->head,
+               loop, "preheader");
         for (const EDGE* e = loop->head->predecessors; e; e = e->rest)
             expect(e->first == pre || e->first == loop->tail, loop, "another entry");
     }
     void check_records(const struct LOOP* loop) {
         for (const LOOPIV* iv : {loop->LCV, loop->VLCV})
-            expect(!iv || std::any_of(loop->IVs.begin(), loop->IVs.end(), [iv](const auto& p) { return p.get() == iv; }), loop, "a control variable without record");
+            expect(!iv ||
+                       std::any_of(loop->IVs.begin(), loop->IVs.end(), [iv](const auto& p) { return p.get() == iv; }),
+                   loop, "a control variable without record");
         for (const auto& iv : loop->IVs) expect(iv->loop == loop && loop->record_of.count(iv->sym), loop, "record");
-        for (const NODE* count : {loop->minTrips, loop->maxTrips, loop->tripFactor}) expect(!count || count->op == ICON, loop, "a bound of the count is no constant");
+        for (const NODE* count : {loop->minTrips, loop->maxTrips, loop->tripFactor})
+            expect(!count || count->op == ICON, loop, "a bound of the count is no constant");
     }
     void check_home(const BBLK* bb) {
         const struct LOOP* loop = bb->loop;
@@ -136,7 +153,8 @@ private:
             return;
         }
         const NATURAL_LOOP* natural = currfuninfo->loops->around(bb);
-        if (!loop->irreducible && !(loop->is_root() && !natural)) expect(natural && natural->header == loop->head, loop, "a block lies in another loop");
+        if (!loop->irreducible && !(loop->is_root() && !natural))
+            expect(natural && natural->header == loop->head, loop, "a block lies in another loop");
     }
 
     int findings = 0;

@@ -1,8 +1,9 @@
 // Loops with one back edge, a preheader and exit blocks of their own.
 //
-// Needs: no hierarchy. Leaves: numbered blocks, dominators and natural loops to be found anew where blocks were inserted.
-// Sound because only empty blocks are put on edges. A promise of iterations in front of a loop that becomes two nested ones
-// is true of neither, and goes. Edges of a dispatch of exceptions stay: the exception table names their targets.
+// Needs: no hierarchy. Leaves: numbered blocks, dominators and natural loops to be found anew where blocks were
+// inserted. Sound because only empty blocks are put on edges. A promise of iterations in front of a loop that becomes
+// two nested ones is true of neither, and goes. Edges of a dispatch of exceptions stay: the exception table names their
+// targets.
 #include "OPT5/dd/loop_shape.h"
 
 #include "OPT5/dd/loop.h"
@@ -167,7 +168,8 @@ bool DISCOVERY::find_natural_loops() {
         if (natural.around(bb) && tree_is_EH_SWITCH(bb->branch())) return false;
     SIDE_TABLE<struct LOOP*> of_head(nullptr);
     for (const auto& found : natural.inner_first()) {
-        hierarchy.loops.push_back(make_LOOP(found->header, found->latches.front(), static_cast<int>(hierarchy.loops.size()) + 1, nullptr));
+        hierarchy.loops.push_back(
+            make_LOOP(found->header, found->latches.front(), static_cast<int>(hierarchy.loops.size()) + 1, nullptr));
         of_head[found->header] = hierarchy.loops.back().get();
     }
     for (const auto& found : natural.inner_first()) {
@@ -188,7 +190,8 @@ bool DISCOVERY::find_natural_loops() {
 // The function's body, around what has no loop around it.
 void DISCOVERY::make_root() {
     BBLK* entry = currfuninfo->bb_list;
-    hierarchy.loops.insert(hierarchy.loops.begin(), make_LOOP(entry, nullptr, static_cast<int>(hierarchy.loops.size()), nullptr));
+    hierarchy.loops.insert(hierarchy.loops.begin(),
+                           make_LOOP(entry, nullptr, static_cast<int>(hierarchy.loops.size()), nullptr));
     struct LOOP* root = hierarchy.loops.front().get();
     for (size_t i = 1; i < hierarchy.loops.size(); ++i)
         if (struct LOOP* loop = hierarchy.loops[i].get(); !loop->parent) {
@@ -284,7 +287,8 @@ public:
                 take_over(bb->loop);
             else
                 enter_exits_of(bb);
-        std::sort(loop->exits.begin(), loop->exits.end(), [](const BBLK* a, const BBLK* b) { return a->serial < b->serial; });
+        std::sort(loop->exits.begin(), loop->exits.end(),
+                  [](const BBLK* a, const BBLK* b) { return a->serial < b->serial; });
     }
 
 private:

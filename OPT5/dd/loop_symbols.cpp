@@ -1,8 +1,8 @@
 // Which variables and trees have one value in all iterations of a loop.
 //
-// A variable that only its NAME reaches is changed by the statements that write the NAME and by nothing else; so a loop that
-// holds no such statement keeps it. What memory holds is not asked here: a reference in normal form is invariant only where
-// the object can never change.
+// A variable that only its NAME reaches is changed by the statements that write the NAME and by nothing else; so a loop
+// that holds no such statement keeps it. What memory holds is not asked here: a reference in normal form is invariant
+// only where the object can never change.
 #include "OPT5/dd/loop.h"
 
 #include "OPT5/alias/effects.h"
@@ -45,7 +45,8 @@ void delete_LOOPIV(LOOPIV* iv) {
 
 LOOPIV* find_LOOPIV_for_IV(const SYMTAB* sym, const struct LOOP* loop, bool outer_too) {
     for (; loop; loop = outer_too ? loop->parent : nullptr)
-        if (auto it = loop->record_of.find(sym); it != loop->record_of.end() && it->second->has(IV_is_IV)) return it->second;
+        if (auto it = loop->record_of.find(sym); it != loop->record_of.end() && it->second->has(IV_is_IV))
+            return it->second;
     return nullptr;
 }
 
@@ -92,7 +93,8 @@ public:
         const bool is_prolog = tree_is_extended_arg_prolog(statement, first);
         walk(statement, false);
         if (is_prolog) return;
-        for_each_written_name(statement, [this](const NODE* name, const NODE*) { make_sym_altered_in_loop(name->u.sym, loop); });
+        for_each_written_name(statement,
+                              [this](const NODE* name, const NODE*) { make_sym_altered_in_loop(name->u.sym, loop); });
     }
 
 private:
@@ -209,7 +211,9 @@ bool tree_is_RC_in_loop(const NODE* t, const struct LOOP* loop, bool lcvCounts) 
         if (loop->VLCV && loop->VLCV->sym == t->u.sym) return true;
         return loop->LCV && loop->LCV->sym == t->u.sym && !loop->LCV->has(IV_update_before_read);
     case UMULT:
-    case STREF: return lvalue_is_immutable(t) && tree_is_RC_in_loop(t->left, loop, lcvCounts) && tree_is_RC_in_loop(t->right, loop, lcvCounts);
+    case STREF:
+        return lvalue_is_immutable(t) && tree_is_RC_in_loop(t->left, loop, lcvCounts) &&
+               tree_is_RC_in_loop(t->right, loop, lcvCounts);
     case UAND:
         if (name_of_place(t->left)) return true;
         return tree_is_RC_in_loop(t->left, loop, lcvCounts);
@@ -240,10 +244,12 @@ int expr_is_affine_in_loop(const NODE* t, const struct LOOP* loop, bool strict) 
     switch (t->op) {
     case PLUS:
     case MINUS:
-    case MULT: return joined(expr_is_affine_in_loop(t->left, loop, strict), expr_is_affine_in_loop(t->right, loop, strict));
+    case MULT:
+        return joined(expr_is_affine_in_loop(t->left, loop, strict), expr_is_affine_in_loop(t->right, loop, strict));
     case UMINUS: return expr_is_affine_in_loop(t->left, loop, strict);
     case SCONV:
-        if (!t->left->type->is_int() || t->type->size < t->left->type->size || t->type->size < tp->long_t->size) return 0;
+        if (!t->left->type->is_int() || t->type->size < t->left->type->size || t->type->size < tp->long_t->size)
+            return 0;
         return expr_is_affine_in_loop(t->left, loop, strict);
     case NAME: return affine_variable(t, loop, strict);
     default: return 0;

@@ -1,13 +1,13 @@
 // What a variable holds at the end of a block.
 //
-// Only variables count that nothing but their NAMEs reaches. The definition that reaches a block is found up the dominator
-// tree: the last write of a block above, unless on the path up stands a block where values of several writes meet (an
-// iterated dominance frontier). Behind a loop with a known count the variable has its value from ahead of it and so many
-// steps.
+// Only variables count that nothing but their NAMEs reaches. The definition that reaches a block is found up the
+// dominator tree: the last write of a block above, unless on the path up stands a block where values of several writes
+// meet (an iterated dominance frontier). Behind a loop with a known count the variable has its value from ahead of it
+// and so many steps.
 //
 // Sound because two places with one reaching definition see one value: between them the variable is not written, on any
-// path. A value is handed on as a tree of constants and of variables whose reaching definition is the same where the tree
-// was computed and where it is asked for.
+// path. A value is handed on as a tree of constants and of variables whose reaching definition is the same where the
+// tree was computed and where it is asked for.
 #include "OPT5/dd/loop.h"
 
 #include "OPT5/alias/effects.h"
@@ -57,7 +57,9 @@ struct REACHING {
     enum KIND { NONE, DEFINED, MEET, ENTRY } kind = NONE;
     const DEFINITION* definition = nullptr;
     BBLK* meet = nullptr;
-    bool operator==(const REACHING& o) const { return kind != NONE && kind == o.kind && definition == o.definition && meet == o.meet; }
+    bool operator==(const REACHING& o) const {
+        return kind != NONE && kind == o.kind && definition == o.definition && meet == o.meet;
+    }
 };
 
 class DEFINITIONS {
@@ -110,9 +112,9 @@ REACHING DEFINITIONS::reaching(const SYMTAB* sym, POINT at, int& budget, bool wi
     const std::vector<int>& meet_blocks = meets(d);
     BBLK* bb = at.bb;
     for (int place = at.place; --budget > 0; place = AT_END) {
-        auto it = std::lower_bound(d.all.begin(), d.all.end(), std::make_pair(bb->dfn, place), [](const DEFINITION& a, const std::pair<int, int>& b) {
-            return std::make_pair(a.bb->dfn, a.place) < b;
-        });
+        auto it = std::lower_bound(
+            d.all.begin(), d.all.end(), std::make_pair(bb->dfn, place),
+            [](const DEFINITION& a, const std::pair<int, int>& b) { return std::make_pair(a.bb->dfn, a.place) < b; });
         while (it != d.all.begin() && std::prev(it)->bb == bb && std::prev(it)->is_assertion && !with_assertions) --it;
         if (it != d.all.begin() && std::prev(it)->bb == bb) {
             r.kind = REACHING::DEFINED;
@@ -159,7 +161,8 @@ private:
     // The outermost loop around `bb` that control has left where the value is asked for.
     struct LOOP* left_loop(const BBLK* bb) const {
         struct LOOP* found = nullptr;
-        for (struct LOOP* l = bb->loop; l && !loop_is_subloop_of_loop(asked.bb->loop, l, true); l = l->parent) found = l;
+        for (struct LOOP* l = bb->loop; l && !loop_is_subloop_of_loop(asked.bb->loop, l, true); l = l->parent)
+            found = l;
         return found;
     }
 
@@ -169,7 +172,8 @@ private:
 };
 
 NODE* SEARCH::value(SYMTAB* sym, POINT at, int depth) {
-    if (depth <= 0 || budget < 2 || !may_be_searched(sym) || (sym->type->qual_kind(false) & QUAL_RESTRICT)) return nullptr;
+    if (depth <= 0 || budget < 2 || !may_be_searched(sym) || (sym->type->qual_kind(false) & QUAL_RESTRICT))
+        return nullptr;
     const REACHING r = known->reaching(sym, at, budget, true);
     switch (r.kind) {
     case REACHING::DEFINED:
@@ -206,8 +210,10 @@ NODE* SEARCH::assigned(SYMTAB* sym, const DEFINITION& d, int depth) {
 NODE* SEARCH::behind_loop(SYMTAB* sym, struct LOOP* loop, int depth) {
     const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, false);
     const EDGE* last = loop->exits.size() == 1 ? loop->exits.front()->predecessors : nullptr;
-    const bool ends_by_test = last && !last->rest && last->first == (loop->is_bottom_tested() ? loop->tail : loop->head);
-    if (!iv || !ends_by_test || !loop->trips || loop->trips->op != ICON || !iv->incrtree || iv->incrtree->op != ICON) return nullptr;
+    const bool ends_by_test =
+        last && !last->rest && last->first == (loop->is_bottom_tested() ? loop->tail : loop->head);
+    if (!iv || !ends_by_test || !loop->trips || loop->trips->op != ICON || !iv->incrtree || iv->incrtree->op != ICON)
+        return nullptr;
     if (!loop->is_bottom_tested() && iv->has(IV_updated_in_head)) return nullptr; // which is executed once more
     if (!iv->has(IV_affine)) return nullptr;
     NODE* start = value(sym, {loop->preheader, AT_END}, depth - 1);
@@ -221,7 +227,9 @@ NODE* SEARCH::behind_loop(SYMTAB* sym, struct LOOP* loop, int depth) {
 // The tree, which is consumed, in values that stand where the search began; null where it has none.
 NODE* SEARCH::resolved(NODE* copy, POINT at, int depth) {
     bool is_known = count_nodes_in_tree(copy) <= MOST_NODES && !tree_has_side_effects(copy) &&
-                    !any_subtree(copy, [](const NODE* n) { return n->op == UMULT || n->op == STREF || n->op == STDOT || op_is_call(n->op); });
+                    !any_subtree(copy, [](const NODE* n) {
+                        return n->op == UMULT || n->op == STREF || n->op == STDOT || op_is_call(n->op);
+                    });
     if (is_known && copy->op == UAND) return copy;
     NODE* t = !is_known ? copy : rewrite_tree(copy, [&](NODE* n) {
         if (n->op != NAME || !is_known) return n;
@@ -298,8 +306,8 @@ BBLK* find_dominator_bb_for_sym(BBLK* bb, SYMTAB* sym, INT65* adjustment) {
     while (left->parent && !loop_is_subloop_of_loop(bb->loop, left->parent, true)) left = left->parent;
     if (sym_is_RC_in_loop(sym, left)) return left->preheader;
     const LOOPIV* iv = find_LOOPIV_for_IV(sym, left, false);
-    if (iv && left->trips && left->trips->op == ICON && !left->has(LOOP_early_exit) && left->is_bottom_tested() && iv->incrtree &&
-        iv->incrtree->op == ICON) {
+    if (iv && left->trips && left->trips->op == ICON && !left->has(LOOP_early_exit) && left->is_bottom_tested() &&
+        iv->incrtree && iv->incrtree->op == ICON) {
         *adjustment = *adjustment + left->trips->u.lval * iv->incrtree->u.lval;
         return left->preheader;
     }

@@ -27,12 +27,14 @@ constexpr int MOST_TEST_NODES = 64;
 bool head_is_small(const BBLK* head) {
     const LIST* s = head->statements;
     if (s->rest) {
-        if (s->first->op == PPRAGMA || s->first->op == ASM || tree_is_arg_prolog(s->first) || tree_contains_op(s->first, ASM) ||
-            tree_contains_op(s->first, CALL) || tree_contains_op(s->first, UCALL) || count_nodes_in_tree(s->first) > MOST_TEST_NODES)
+        if (s->first->op == PPRAGMA || s->first->op == ASM || tree_is_arg_prolog(s->first) ||
+            tree_contains_op(s->first, ASM) || tree_contains_op(s->first, CALL) || tree_contains_op(s->first, UCALL) ||
+            count_nodes_in_tree(s->first) > MOST_TEST_NODES)
             return false;
         s = s->rest;
     }
-    return !s->rest && s->first->op == IF && s->first->left->op != ENDLOOP && count_nodes_in_tree(s->first->left) <= MOST_TEST_NODES;
+    return !s->rest && s->first->op == IF && s->first->left->op != ENDLOOP &&
+           count_nodes_in_tree(s->first->left) <= MOST_TEST_NODES;
 }
 
 bool has_shape(const struct LOOP* loop) {
@@ -43,7 +45,9 @@ bool has_shape(const struct LOOP* loop) {
 
 // Of the condition: a comparison of what moves in the loop with what stays; the side that stays, or null.
 NODE** staying_side(NODE* condition, const struct LOOP* loop) {
-    if (!op_is_int_compare(condition->op) || tree_has_side_effects(condition) || tree_is_RC_in_loop(condition, loop, false)) return nullptr;
+    if (!op_is_int_compare(condition->op) || tree_has_side_effects(condition) ||
+        tree_is_RC_in_loop(condition, loop, false))
+        return nullptr;
     for (const NODE* side : {condition->left, condition->right})
         if (!side->type->is_int() && !side->type->is_pointer() && !side->type->is_enum()) return nullptr;
     auto stays = [loop](const NODE* t) { return tree_is_RC_in_loop(t, loop, true); };
@@ -54,7 +58,8 @@ NODE** staying_side(NODE* condition, const struct LOOP* loop) {
 
 // What stays is computed once, in the guard, if that takes an operation that the loop would repeat.
 void keep_in_temporary(NODE** side, const struct LOOP* loop) {
-    if (count_nodes_in_tree(*side, true) == 0 || expr_is_constant(*side) || !tree_is_RC_in_loop(*side, loop, false)) return;
+    if (count_nodes_in_tree(*side, true) == 0 || expr_is_constant(*side) || !tree_is_RC_in_loop(*side, loop, false))
+        return;
     SYMTAB* sym = sym_temp('T', -1, (*side)->type->stqs(), (*side)->ls);
     BBLK* head = loop->head;
     LIST** link = &head->statements;
@@ -63,12 +68,13 @@ void keep_in_temporary(NODE** side, const struct LOOP* loop) {
     *side = mk_NAME(sym);
 }
 
-// Whether a test on top of a loop around decides the condition: in the body its control variable is ahead of its limit up
-// to the update at the end.
+// Whether a test on top of a loop around decides the condition: in the body its control variable is ahead of its limit
+// up to the update at the end.
 bool is_implied_around(const NODE* condition, const struct LOOP* loop) {
     bool holds = false;
     for (const struct LOOP* outer = loop->parent; outer && !outer->is_root() && !holds; outer = outer->parent) {
-        if (outer->is_bottom_tested() || !outer->LCV || outer->LCV->has(IV_updated_in_head) || !outer->LCV->last) continue;
+        if (outer->is_bottom_tested() || !outer->LCV || outer->LCV->has(IV_updated_in_head) || !outer->LCV->last)
+            continue;
         if (loop->head == outer->tail || loop->preheader == outer->head) continue;
         NODE* known = maketree(outer->test, mk_NAME(outer->LCV->sym), copy_tree(outer->LCV->last), tp->int_t);
         known = simp_tree(known, nullptr);
@@ -99,7 +105,9 @@ struct REPLICATION {
 // What is tested for truth is compared with 0: a variable, or one behind a step, n + 1, which is n != -1.
 void compare_with_zero(NODE* test) {
     NODE* value = test->left;
-    if (!value->type->is_int() || value->type->is_bool() || (value->op != NAME && value->op != PLUS && value->op != MINUS)) return;
+    if (!value->type->is_int() || value->type->is_bool() ||
+        (value->op != NAME && value->op != PLUS && value->op != MINUS))
+        return;
     TYPE* type = value->type->stqs();
     NODE* t = value->op == NAME ? maketree(NEQ, value, mk_ICON(INT65(0), type), tp->int_t)
                                 : simp_tree(maketree(NEQ, value, mk_ICON(INT65(0), type), tp->int_t), nullptr);
@@ -111,7 +119,8 @@ bool is_replicable(struct LOOP* loop, REPLICATION* r) {
     if (!has_shape(loop) || !staying_side(loop->head->branch()->left, loop)) return false;
     const NODE* targets = loop->head->branch()->right;
     BBLK *yes = targets->left->lbl->bblock, *no = targets->right->lbl->bblock;
-    const bool yes_stays = loop_is_subloop_of_loop(yes->loop, loop, true), no_stays = loop_is_subloop_of_loop(no->loop, loop, true);
+    const bool yes_stays = loop_is_subloop_of_loop(yes->loop, loop, true),
+               no_stays = loop_is_subloop_of_loop(no->loop, loop, true);
     if (yes_stays == no_stays) return false;
     *r = {loop, yes_stays ? yes : no, yes_stays ? no : yes, decided_first_test(loop)};
     return true;
@@ -121,7 +130,8 @@ bool is_replicable(struct LOOP* loop, REPLICATION* r) {
 void copy_test_to_tail(const REPLICATION& r) {
     BBLK *head = r.loop->head, *tail = r.loop->tail;
     NODE** side = staying_side(head->branch()->left, r.loop);
-    debug_printf("\n\tReplicating WHILE loop test (loop #%d):\n\t%s\n\n", r.loop->uid, tree_to_infix(head->branch()->left).c_str());
+    debug_printf("\n\tReplicating WHILE loop test (loop #%d):\n\t%s\n\n", r.loop->uid,
+                 tree_to_infix(head->branch()->left).c_str());
     if (head->statements->rest) insert_at_end_of_body(tail, copy_tree(head->statements->first));
     keep_in_temporary(side, r.loop);
     LIST* last = tail->last_statement();

@@ -19,11 +19,10 @@
 
 namespace {
 
-
 bool has_hierarchy() { return currfuninfo->bb_list && currfuninfo->bb_list->loop; }
 
-// What is still to be done behind the last row: rows with a frame follow each other, and the form that one leaves the next
-// begins with.
+// What is still to be done behind the last row: rows with a frame follow each other, and the form that one leaves the
+// next begins with.
 enum KEPT : uint8_t { NOTHING, FORM, CHANGED_FORM } kept = NOTHING;
 
 void enter_form() {

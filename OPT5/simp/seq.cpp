@@ -80,11 +80,12 @@ private:
         return true;
     }
 
-    // A loop that was written with its test on top, and jumps back right behind it, has no body: it evaluates its test once
-    // more than it has iterations, and a reader would take that for the number that was promised.
+    // A loop that was written with its test on top, and jumps back right behind it, has no body: it evaluates its test
+    // once more than it has iterations, and a reader would take that for the number that was promised.
     static void drop_promises_of_test_loop(LIST* back, const NODE* target) {
         while (back && back->first->op != LABELDEF && !op_transfers_control(back->first->op)) back = back->rest;
-        if (!back || back->first->op != LABELDEF || back->first->lbl->index != target->u.lval.fits_in<int32_t>()) return;
+        if (!back || back->first->op != LABELDEF || back->first->lbl->index != target->u.lval.fits_in<int32_t>())
+            return;
         auto is_pragma = [](const LIST* c) { return c && c->first->op == PPRAGMA; };
         for (const LIST* c = back->rest; is_pragma(c); c = c->rest) {
             const PRAGMA* p = c->first->pragma;
@@ -303,7 +304,8 @@ void seq_trees(NODE* (*prepare)(NODE*)) {
         }
         SEQUENCER sequencer(&out, psn, !prepare, catches);
         sequencer.statement(t);
-        if (const NODE* last = sequencer.last_statement(); last && is_call_that_never_returns(last)) end_flow_behind(&out, psn);
+        if (const NODE* last = sequencer.last_statement(); last && is_call_that_never_returns(last))
+            end_flow_behind(&out, psn);
     }
     f->statements = out;
     f->has_vector_types = false;
@@ -349,7 +351,8 @@ NODE* make_magic_EH_SWITCH(NODE* call, NODE* fall_through, const EH_HANDLERS* ha
     for (const EHT_ITEM& item : currfuninfo->eht)
         for (const EHT_CATCH& clause : item.catches) {
             if (handlers && !handlers->count(clause.id)) continue;
-            NODE* to = handlers ? mk_LABELREF(handlers->at(clause.id)) : ref_to_numbered(static_cast<uint32_t>(clause.label));
+            NODE* to =
+                handlers ? mk_LABELREF(handlers->at(clause.id)) : ref_to_numbered(static_cast<uint32_t>(clause.label));
             NODE* entry = maketree(CASE, mk_ICON(INT65(clause.id), tp->int_t), to, tp->int_t, scope);
             ++count;
             cases = cases ? maketree(COMMA, cases, entry, tp->int_t, scope) : entry;

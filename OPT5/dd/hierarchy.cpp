@@ -150,7 +150,7 @@ std::unique_ptr<struct LOOP> make_LOOP(BBLK* head, BBLK* tail, int uid, const st
     if (model) copy_facts(*model, *loop);
     if (head) loop->head = head;
     if (tail) loop->tail = tail;
-    if (uid >= 0) loop->uid = static_cast<uint16_t>(uid);
+    if (uid >= 0) loop->uid = uid;
     return loop;
 }
 
@@ -203,7 +203,7 @@ void assign_loop_numbers(struct LOOP* root, int number) {
     while (!waiting.empty()) {
         struct LOOP* loop = waiting.back();
         waiting.pop_back();
-        loop->uid = static_cast<uint16_t>(number++);
+        loop->uid = number++;
         const size_t first = waiting.size();
         for_each_subloop(loop, [&](struct LOOP* inner) { waiting.push_back(inner); });
         std::reverse(waiting.begin() + static_cast<std::ptrdiff_t>(first), waiting.end());

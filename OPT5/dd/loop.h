@@ -156,7 +156,7 @@ struct LOOP {
     std::vector<NODE*> givens; // conditions that hold throughout the loop; those of FUNINFO outlive the hierarchy
     SOURCE_PLACE sourceStart, sourceEnd;
     uint32_t flags = 0;
-    uint16_t uid = 0; // depth first from 0, the root
+    int uid = 0; // depth first from 0, the root
     uint16_t unrollAmount = 1;
     int16_t level = 0;
     uint8_t test = 0; // of the exit predicate `LCV test last`: control stays in the loop while it holds; ILLOP without

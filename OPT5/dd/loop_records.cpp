@@ -30,10 +30,12 @@ uint32_t saturated(const NODE* icon, uint32_t absent) {
     return v > INT65(int64_t(UINT32_MAX)) ? UINT32_MAX : static_cast<uint32_t>(v.value);
 }
 
+uint32_t uid_of(const struct LOOP* loop) { return static_cast<uint32_t>(loop->uid); }
+
 CODE_LOOP record_of(const struct LOOP* loop) {
     CODE_LOOP r;
-    r.id = loop->uid;
-    r.outer = loop->is_root() ? loop->uid : loop->parent->uid;
+    r.id = uid_of(loop);
+    r.outer = uid_of(loop->is_root() ? loop : loop->parent);
     r.flags = static_cast<uint16_t>(loop->flags & 254);
     if (loop->is_root()) {
         r.max = 1;
@@ -142,11 +144,11 @@ void write_loop_icode(struct LOOP* root) {
     records.loops.clear();
     records.loop_of.assign(currfuninfo->objects.size(), CODE_RECORDS::NOWHERE);
     for (const struct LOOP* loop : loops_outer_first(root)) {
-        if (records.loops.size() <= loop->uid) records.loops.resize(loop->uid + 1u);
-        records.loops[loop->uid] = record_of(loop);
+        if (records.loops.size() <= uid_of(loop)) records.loops.resize(uid_of(loop) + 1);
+        records.loops[uid_of(loop)] = record_of(loop);
     }
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        if (bb->loop) records.loop_of[bb->serial] = bb->loop->uid;
+        if (bb->loop) records.loop_of[bb->serial] = uid_of(bb->loop);
 }
 
 void settle_loop_records() {

@@ -238,4 +238,11 @@ TEST_F(LoopPragmas, OfALoopThatIsGone) {
     EXPECT_TRUE(pragmas().empty());
 }
 
+TEST_F(LoopPragmas, LoopsAreMoreThanAHalfWordCounts) {
+    build_loop_hierarchy(false, false, false, 1);
+    assign_loop_numbers(loop_root(), 65535);
+    for_each_subloop(loop_root(), [](struct LOOP* l) { EXPECT_EQ(l->uid, 65536); });
+    unbuild_loop_hierarchy();
+}
+
 } // namespace

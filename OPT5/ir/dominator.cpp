@@ -101,6 +101,7 @@ void Dominator::builder() {
 }
 
 void Dominator::generate_tree_walk() {
+    below = post_below = INTERVALS();
     children.assign(idom.size(), {});
     post_children.assign(idom.size(), {});
     for (int b = 1; b <= saved_bb_count; ++b) {
@@ -142,12 +143,36 @@ BBLK* Dominator::immediate_post_dominator(const BBLK* bb) {
     return immediate_post_dominator(bb->dfn);
 }
 
+void Dominator::INTERVALS::number(int root, const std::vector<std::vector<int>>& tree) {
+    first.assign(tree.size(), 0);
+    last.assign(tree.size(), 0);
+    int n = 0;
+    std::vector<std::pair<int, size_t>> stack{{root, 0}};
+    first[static_cast<size_t>(root)] = ++n;
+    while (!stack.empty()) {
+        auto& [node, next] = stack.back();
+        const auto& list = tree[static_cast<size_t>(node)];
+        if (next == list.size()) {
+            last[static_cast<size_t>(node)] = n;
+            stack.pop_back();
+            continue;
+        }
+        const int child = list[next++];
+        first[static_cast<size_t>(child)] = ++n;
+        stack.emplace_back(child, 0);
+    }
+}
+
+bool Dominator::INTERVALS::covers(int a, int b) const {
+    const auto x = static_cast<size_t>(a), y = static_cast<size_t>(b);
+    return first[x] && first[x] <= first[y] && first[y] <= last[x];
+}
+
 bool Dominator::dominates(int a, int b) {
     refresh();
     if (a < 1 || b < 1 || a > saved_bb_count || b > saved_bb_count) return false;
-    // A dominator numbers below what it dominates.
-    while (b > a && idom[static_cast<size_t>(b)] != UNDEFINED && idom[static_cast<size_t>(b)] != b) b = idom[static_cast<size_t>(b)];
-    return a == b;
+    if (below.first.empty()) below.number(1, children);
+    return a == b || below.covers(a, b);
 }
 bool Dominator::dominates(const BBLK* a, const BBLK* b) {
     refresh();
@@ -157,11 +182,8 @@ bool Dominator::dominates(const BBLK* a, const BBLK* b) {
 bool Dominator::post_dominates(int a, int b) {
     refresh();
     if (a < 1 || b < 1 || a > saved_bb_count || b > saved_bb_count) return false;
-    while (b != a && b > 0) {
-        if (ipostdom[static_cast<size_t>(b)] == UNDEFINED) return false;
-        b = ipostdom[static_cast<size_t>(b)];
-    }
-    return a == b;
+    if (post_below.first.empty()) post_below.number(0, post_children);
+    return a == b || post_below.covers(a, b);
 }
 bool Dominator::post_dominates(const BBLK* a, const BBLK* b) {
     refresh();

@@ -34,11 +34,18 @@ public:
     void print_POSTDOM(FILE* out);
 
 private:
+    // Numbers of a walk over a tree, by dfn: what is below a node lies in its interval. Empty until they are asked for.
+    struct INTERVALS {
+        std::vector<int> first, last;
+        void number(int root, const std::vector<std::vector<int>>& tree);
+        bool covers(int a, int b) const;
+    };
     void builder();
     void refresh();
     void generate_tree_walk();
     std::vector<BBLK*> by_dfn;
     std::vector<std::vector<int>> children, post_children;
+    INTERVALS below, post_below;
     int saved_bb_count = 0;
     int exit_dfn = 0;
 };

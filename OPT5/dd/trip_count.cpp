@@ -420,7 +420,9 @@ bool first_test_holds(const struct LOOP* loop) {
     if (tree_has_side_effects(entry.get())) return false;
     OWNED_TREE simplified(simp_tree(copy_tree(entry.get()), in));
     if (simplified->op == ICON) return !simplified->u.lval.is_zero();
-    for (const struct LOOP* l = loop; l; l = l->parent) {
+    constexpr int MOST_LEVELS = 8;
+    int levels = MOST_LEVELS;
+    for (const struct LOOP* l = loop; l && --levels >= 0; l = l->parent) {
         if (l->givens.size() > 64) break;
         for (const NODE* given : l->givens)
             if (pred_implies_pred(given, true, entry.get()) == 1 ||

@@ -71,8 +71,11 @@ void keep_in_temporary(NODE** side, const struct LOOP* loop) {
 // Whether a test on top of a loop around decides the condition: in the body its control variable is ahead of its limit
 // up to the update at the end.
 bool is_implied_around(const NODE* condition, const struct LOOP* loop) {
+    constexpr int MOST_LEVELS = 8;
     bool holds = false;
-    for (const struct LOOP* outer = loop->parent; outer && !outer->is_root() && !holds; outer = outer->parent) {
+    int levels = MOST_LEVELS;
+    for (const struct LOOP* outer = loop->parent; outer && !outer->is_root() && !holds && --levels >= 0;
+         outer = outer->parent) {
         if (outer->is_bottom_tested() || !outer->LCV || outer->LCV->has(IV_updated_in_head) || !outer->LCV->last)
             continue;
         if (loop->head == outer->tail || loop->preheader == outer->head) continue;

@@ -88,6 +88,8 @@ private:
         for (size_t i = 1; i < n; ++i)
             if (used[i]) new_ids[i] = ++count;
         if (count + 1 == n) return;
+        // Some stand in clean-up code that goes.
+        for (NODE* call : calls) call->set_eh_entry(new_ids[call->eh_entry()]);
         for (size_t i = 1; i < n; ++i) {
             if (!used[i]) {
                 erase_tree(eht[i].cleanup);
@@ -100,7 +102,6 @@ private:
             eht[new_ids[i]] = std::move(item);
         }
         eht.resize(count + 1);
-        for (NODE* call : calls) call->set_eh_entry(new_ids[call->eh_entry()]);
     }
 
     FUNINFO* f;

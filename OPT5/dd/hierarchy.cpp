@@ -351,6 +351,7 @@ void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoo
         find_loop_assertions(nullptr);
     }
     maybe_clear_restrict_in_inner_loops();
+    if (full && unsigned_index_wraps) insert_affine_marks(loop_root());
     rebind_clones(loop_root());
     if (print_debug) dump_loop_hierarchy(loop_root());
 }

@@ -10,12 +10,14 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
+#include "OPT5/target/bif.h"
 #include "UTIL/safemem.h"
 
 #include <algorithm>
@@ -273,10 +275,20 @@ bool drops_conversion(const LOOPIV* iv) {
            t->left->type->is_unsigned() && t->left->type->size >= t->type->size;
 }
 
+bool is_affine_mark(const NODE* t, const SYMTAB* sym) {
+    return t->op == NASSERT && t->left && is_AFFINE_IV_sym_ICALL(t->left, sym);
+}
+bool is_marked_affine(const SYMTAB* sym, const struct LOOP* loop) {
+    for (const LIST* s = loop->head->statements; currfuninfo->has_affine_marks && s; s = s->rest)
+        if (is_affine_mark(s->first, sym)) return true;
+    return false;
+}
+
 // False where the record had to go.
 bool make_IV_record(SYMTAB* sym, struct LOOP* loop, size_t symbols) {
     LOOPIV* iv = alloc_LOOPIV(sym, loop);
-    const bool is_sure = !unsigned_index_wraps || sym->type->is_pointer() || sym->type->is_signed();
+    const bool is_sure = !unsigned_index_wraps || sym->type->is_pointer() || sym->type->is_signed() ||
+                         is_marked_affine(sym, loop);
     iv->flags = IV_is_IV | (is_sure ? uint64_t(IV_affine) : 0);
     INCREMENT(iv, loop).accumulate();
     iv->init = value_on_entry(sym, loop, symbols);
@@ -328,6 +340,7 @@ private:
         return iv == loop->VLCV ? nullptr : iv;
     }
     void scan(const NODE* t, bool is_exit_test) {
+        if (t->op == NASSERT || t->op == ASSERT) return;
         INDUCTION_UPDATE u;
         if (is_induction_update(t, &u))
             if (LOOPIV* iv = record(t->left)) {
@@ -533,6 +546,38 @@ NODE* eval_expr_for_2nd_iteration(const NODE* expr, struct LOOP* loop) {
         return iv->init && iv->incrtree ? stepped(iv, copy_tree(iv->init), mk_ICON(INT65(1), arithmetic_type(iv)), loop)
                                         : nullptr;
     });
+}
+
+// ---- Marks of affine counters
+
+void insert_affine_marks(struct LOOP* root) {
+    for (struct LOOP* loop : loops_outer_first(root)) {
+        if (!loop->is_bottom_tested()) continue;
+        for (const auto& iv : loop->IVs) {
+            const TYPE* type = iv->sym->type;
+            if (iv.get() == loop->VLCV || !iv->has(IV_is_IV) || !iv->has(IV_affine) || !type->is_int() ||
+                !type->is_unsigned() || is_marked_affine(iv->sym, loop))
+                continue;
+            NODE* mark = maketree(NASSERT, make_AFFINE_IV_sym_ICALL(iv->sym), nullptr, tp->void_t);
+            insert_before(&loop->head->statements, mark, loop->head->statements->psn);
+            currfuninfo->has_affine_marks = true;
+        }
+    }
+}
+
+void drop_affine_marks() {
+    if (!currfuninfo->has_affine_marks) return;
+    currfuninfo->has_affine_marks = false;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST** link = &bb->statements; *link && (*link)->rest;) {
+            const NODE* t = (*link)->first;
+            const bool is_mark = t->op == NASSERT && t->left->op == ICALL && t->left->left && t->left->left->op == NAME &&
+                                 is_affine_mark(t, t->left->left->u.sym);
+            if (is_mark)
+                drop_statement(link);
+            else
+                link = &(*link)->rest;
+        }
 }
 
 // ---- The virtual control variable

@@ -250,6 +250,10 @@ struct INDUCTION_UPDATE {
 };
 bool is_induction_update(const NODE* statement, INDUCTION_UPDATE* update);
 
+// In the head of a bottom-tested loop a statement says of an unsigned counter that was proved affine that it is: a later
+// build need not find the proof again. They go with the work on loops.
+void insert_affine_marks(struct LOOP* root);
+void drop_affine_marks();
 void find_loop_IVs(struct LOOP* loop);
 bool find_loop_LCV(struct LOOP* loop); // whether one was proved
 NODE* find_loop_predicate(

@@ -16,6 +16,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
+#include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/symbolic.h"
 
 #include <algorithm>
@@ -128,6 +129,11 @@ void refine_loop_highlow(struct LOOP* loop) {
         const WIDE more = overshoot(loop->test, up ? *step : -*step);
         RANGE r{to_wide(int_type_min(type)), to_wide(int_type_max(type))};
         (up ? r.max : r.min) = up ? std::min(r.max, limit->max + more) : std::max(r.min, limit->min - more);
+        // Bits that the limit never has bound it from above where it is not negative.
+        if (up && limit->min >= 0) {
+            const INT65 possible = ~find_known_zeros(iv->last, type) & int_type_max(type);
+            r.max = std::min(r.max, to_wide(possible) + more);
+        }
         constrain(iv, r, 0);
     }
 }

@@ -68,6 +68,7 @@ bool has_loops() {
 }
 
 void drop_hierarchy() {
+    drop_affine_marks();
     if (!has_hierarchy()) return;
     reinsert_loop_pragmas(currfuninfo->bb_list->loop);
     erase_loop_hierarchy();

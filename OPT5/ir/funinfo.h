@@ -141,6 +141,7 @@ public:
     bool address_taken_local = false, has_bitfield_access = false, has_cqual10_name = false;
     bool no_calls = true; // no CALL or UCALL was made in this function
     bool has_nasserts = false;
+    bool has_affine_marks = false; // statements that say which unsigned counters do not wrap, while loops are worked on
     bool has_intrinsics = false; // a built-in was read or made; never cleared
     bool has_vector_types = false, has_complex_types = false, simd_allowed = false;
     bool is_written = false;

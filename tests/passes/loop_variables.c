@@ -120,6 +120,16 @@ long carried(int x) {
     return s;
 }
 
+// That a counter does not wrap is said in the loop while loops are worked on, and no longer.
+// FUNCTION: unsigned_counter
+// COUNT 0: AFFINE
+// HAS: /MUST_ITERATE\("10", "10", "10"\)/
+int unsigned_counter(void) {
+    int s = 0;
+    for (unsigned u = 3; u < 33u; u += 3) s = s * 3 + g[u >> 1];
+    return s;
+}
+
 int main(void) {
     put_i32(carried(3));
     put_i32(narrowed());
@@ -133,5 +143,6 @@ int main(void) {
     put_i16(sometimes(30));
     put_i16(g[19] + m[9][9]);
     stopped(40);
+    put_i16(unsigned_counter());
     return 0;
 }

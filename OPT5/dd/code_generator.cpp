@@ -26,16 +26,6 @@
 
 namespace {
 
-bool is_told_of_loops() { return (float_support | 1) == 11; }
-
-void print_scopes() {
-    if (!fdebug) return;
-    if (currfuninfo->ls_root)
-        currfuninfo->ls_root->print(fdebug);
-    else
-        debug_printf("<<NULL SCOPE>>\n");
-}
-
 // Conditions that the program asserts have served. Whether there were any.
 bool delete_NASSERTs() {
     bool any = false;
@@ -87,7 +77,7 @@ void remove_dead_assignments() {
 
 void do_dd_analysis_for_be() {
     simpcfg(0, 0);
-    if (opt_level() < 2 || !is_told_of_loops()) return;
+    if (opt_level() < 2 || !has_hardware_float()) return;
     debug_printf("\n\n\t\t\t---------- ENTERING 'do_dd_analysis_for_be' -------\n");
     if (print_debug) print_scopes();
     do_dd_for_be = true;

@@ -1,8 +1,9 @@
 // The build of the loop hierarchy: shape, loops, symbols, variables, counts, and once more where a test was replicated.
 //
 // Needs: trees in normal form, alias marks. Leaves: a hierarchy, or none where the function can have none; block
-// numbers. Sound because the tree is made anew from the graph after every change of it, and what earlier passes
-// promised of a loop is taken into its record and put back in front of it.
+// numbers.
+// Sound because the tree is made anew from the graph after every change of it, and what earlier passes promised of a
+// loop is taken into its record and put back in front of it.
 #include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
@@ -65,7 +66,7 @@ std::unique_ptr<LOOPIV> copy_of(const LOOPIV& iv, struct LOOP* loop) {
     return copy;
 }
 
-// Both leave the copies with the loop `to`, whose control variables are among them.
+// The copies are those of the loop `to`, whose control variables are among them.
 void copy_LOOPIV_list(const struct LOOP& from, struct LOOP& to) {
     for (const auto& iv : from.IVs) {
         to.IVs.push_back(copy_of(*iv, &to));
@@ -74,10 +75,6 @@ void copy_LOOPIV_list(const struct LOOP& from, struct LOOP& to) {
         if (iv.get() == from.LCV) to.LCV = copy;
         if (iv.get() == from.VLCV) to.VLCV = copy;
     }
-}
-void copy_LOOPLV_list(const struct LOOP& from, struct LOOP& to) {
-    to.LVs = from.LVs;
-    for (LOOPLV& lv : to.LVs) lv.loop = &to;
 }
 
 // The pragma fields that hold one tree.
@@ -91,62 +88,21 @@ constexpr NODE* LOOP::*PRAGMA_FIELDS[] = {
 constexpr std::vector<NODE*> LOOP::*PRAGMA_LISTS[] = {&LOOP::noAliasAdvice, &LOOP::aliasAdvice, &LOOP::alignAdvice,
                                                       &LOOP::inlineAdvice};
 constexpr NODE* LOOP::*COUNT_FIELDS[] = {&LOOP::trips, &LOOP::tripFactor, &LOOP::maxTrips, &LOOP::minTrips};
-constexpr int32_t LOOP::*ESTIMATES[] = {
-    &LOOP::constraint_flags,
-    &LOOP::unPartitionedII,
-    &LOOP::partitionedII,
-    &LOOP::resII,
-    &LOOP::recII,
-    &LOOP::minII,
-    &LOOP::estII,
-    &LOOP::LUnits,
-    &LOOP::SUnits,
-    &LOOP::MUnits,
-    &LOOP::DUnits,
-    &LOOP::addUnits,
-    &LOOP::logicalUnits,
-    &LOOP::reg_pressure,
-    &LOOP::predicatePressure,
-    &LOOP::live2longs,
-    &LOOP::interruptLimit,
-    &LOOP::Xpaths,
-    &LOOP::Tpaths,
-    &LOOP::longReads,
-    &LOOP::longWrites,
-};
 
 void copy_facts(const struct LOOP& from, struct LOOP& to) {
-    to.contents = from.contents;
-    to.exits = from.exits;
-    to.preheader = from.preheader;
-    to.head = from.head;
-    to.tail = from.tail;
-    to.RC_syms = from.RC_syms;
-    to.ALT_syms = from.ALT_syms;
-    to.IV_syms = from.IV_syms;
-    to.virtual_symbol = from.virtual_symbol;
+    static_cast<LOOP_VALUES&>(to) = from;
+    for (LOOPLV& lv : to.LVs) lv.loop = &to;
     copy_LOOPIV_list(from, to);
-    copy_LOOPLV_list(from, to);
     for (auto field : COUNT_FIELDS) to.*field = copied(from.*field);
     for (auto field : PRAGMA_FIELDS) to.*field = copied(from.*field);
     for (auto list : PRAGMA_LISTS) to.*list = copied(from.*list);
-    for (auto number : ESTIMATES) to.*number = from.*number;
     to.givens = copied(from.givens);
-    to.sourceStart = from.sourceStart;
-    to.sourceEnd = from.sourceEnd;
-    to.flags = from.flags;
-    to.uid = from.uid;
-    to.unrollAmount = from.unrollAmount;
-    to.level = from.level;
-    to.test = from.test;
-    to.irreducible = from.irreducible;
 }
 
 } // namespace
 
 std::unique_ptr<struct LOOP> make_LOOP(BBLK* head, BBLK* tail, int uid, const struct LOOP* model) {
     auto loop = std::make_unique<struct LOOP>();
-    loop->test = ILLOP;
     if (model) copy_facts(*model, *loop);
     if (head) loop->head = head;
     if (tail) loop->tail = tail;

@@ -14,6 +14,9 @@ struct LIST;
 struct NATURAL_LOOP;
 class NATURAL_LOOPS;
 
+// Levels of loops in a loop that is looked at: each looks at everything in it, what is further out stays.
+constexpr int DEEPEST = 8;
+
 // A variable that every assignment of the loop steps by an invariant amount, in a statement of its own.
 struct INDUCTION {
     struct STEP {

@@ -28,7 +28,6 @@
 
 namespace {
 
-constexpr int DEEPEST = 8; // levels of loops in a loop that is looked at: each looks at all in it
 constexpr size_t MOST_VALUES = 4, MOST_POINTERS = 6, MOST_CANDIDATES = 32; // of a loop
 constexpr int MOST_NODES = 32, MOST_QUESTIONS = 8;                         // the latter look at the whole loop
 constexpr double ITERATIONS = 8;                                           // of a loop, as an estimate

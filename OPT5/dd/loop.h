@@ -28,7 +28,6 @@
 
 class SYMTAB;
 struct LOOP;
-class DDEP;
 
 // By the order in which symbols were made.
 struct BY_UID {
@@ -69,8 +68,8 @@ struct LOOPIV {
     std::vector<NODE*> entryGivens; // conditions on the value on entry
     NODE* norm = nullptr;
     NODE *ssa_norm = nullptr, *ssa_init = nullptr, *ssa_incr = nullptr; // in SSA form, not built yet
-    NODE* init = nullptr; // on entry; null: not known
-    NODE* last = nullptr; // in the last iteration; the control variable's is the limit that it is tested against
+    NODE* init = nullptr;                                               // on entry; null: not known
+    NODE* last = nullptr;     // in the last iteration; the control variable's is the limit that it is tested against
     NODE* incrtree = nullptr; // by iteration
     NODE* virtualInit = nullptr;
     INT65 highval, lowval; // bounds of the value
@@ -124,10 +123,8 @@ struct SOURCE_PLACE {
     int64_t line = 0, column = 0;
 };
 
-struct LOOP {
-    LOOP* parent = nullptr; // null of the root
-    LOOP* counterpart = nullptr;
-    LOOP* reflection = nullptr;
+// What a copy of a loop has in common with it as it is: no trees, no links to other loops.
+struct LOOP_VALUES {
     std::vector<BBLK*> contents; // by block number; of a loop in it the head alone, whose `loop` is that loop
     std::vector<BBLK*> exits;    // blocks outside that are reached from it, and from nowhere else; by block number
     BBLK* preheader = nullptr;   // null of the root
@@ -136,36 +133,43 @@ struct LOOP {
     SYM_SET RC_syms;      // read and not changed in the loop, of no loop around it
     SYM_SET ALT_syms;     // changed
     std::vector<SYMTAB*> IV_syms;
-    LOOPIV* LCV = nullptr;                  // of `IVs`
-    LOOPIV* VLCV = nullptr;                 // of `IVs`: the count of iterations from 0
-    std::shared_ptr<SYMTAB> virtual_symbol; // its, on no list of the function
-    std::vector<std::unique_ptr<LOOPIV>> IVs;
-    std::unordered_map<const SYMTAB*, LOOPIV*> record_of; // those of `IVs`; looked up alone
+    std::shared_ptr<SYMTAB> virtual_symbol; // of the virtual control variable, on no list of the function
     std::vector<LOOPLV> LVs;
-    NODE* trips = nullptr; // executions of the tail for each entry; an ICON where exact
-    NODE *tripFactor = nullptr, *maxTrips = nullptr, *minTrips = nullptr; // ICONs, null before they are asked for
-    // PPRAGMA trees, null without.
-    NODE *mustIterate = nullptr, *probIterate = nullptr, *unrollPragma = nullptr, *unrollAmountPragma = nullptr;
-    NODE *loopNoAliasPragma = nullptr, *mmaLoopPragma = nullptr, *sourceLoopPragma = nullptr;
-    NODE *tripCntrMungedPragma = nullptr, *noAliasClonePragma = nullptr, *loopFlagsPragma = nullptr;
-    NODE *parallelLoopPragma = nullptr, *coalesceLoopPragma = nullptr, *noCoalesceLoopPragma = nullptr,
-         *noNlcPragma = nullptr;
-    NODE *spConstraintPragma = nullptr, *iiEstimatePragma = nullptr, *unitResourcesPragma = nullptr;
-    NODE *spHindrancesPragma = nullptr, *readWritePragma = nullptr;
-    std::vector<NODE*> noAliasAdvice, aliasAdvice, alignAdvice, inlineAdvice;
-    std::vector<NODE*> givens; // conditions that hold throughout the loop; those of FUNINFO outlive the hierarchy
     SOURCE_PLACE sourceStart, sourceEnd;
     uint32_t flags = 0;
     int uid = 0; // depth first from 0, the root
     uint16_t unrollAmount = 1;
     int16_t level = 0;
-    uint8_t test = 0; // of the exit predicate `LCV test last`: control stays in the loop while it holds; ILLOP without
+    uint8_t test; // of the exit predicate `LCV test last`: control stays in the loop while it holds; ILLOP without
     bool irreducible = false; // of the root: a cycle is no natural loop, so that the tree is the root alone
     int32_t constraint_flags = 0;
     int32_t unPartitionedII = 0, partitionedII = 0, resII = 0, recII = 0, minII = 0, estII = 0;
     int32_t LUnits = 0, SUnits = 0, MUnits = 0, DUnits = 0, addUnits = 0, logicalUnits = 0;
     int32_t reg_pressure = 0, predicatePressure = 0, live2longs = 0, interruptLimit = 0;
     int32_t Xpaths = 0, Tpaths = 0, longReads = 0, longWrites = 0;
+
+    LOOP_VALUES() : test(ILLOP) {}
+};
+
+struct LOOP : LOOP_VALUES {
+    LOOP* parent = nullptr; // null of the root
+    LOOP* counterpart = nullptr;
+    LOOP* reflection = nullptr;
+    LOOPIV* LCV = nullptr;  // of `IVs`
+    LOOPIV* VLCV = nullptr; // of `IVs`: the count of iterations from 0
+    std::vector<std::unique_ptr<LOOPIV>> IVs;
+    std::unordered_map<const SYMTAB*, LOOPIV*> record_of; // those of `IVs`; looked up alone
+    NODE* trips = nullptr;                                // executions of the tail for each entry; an ICON where exact
+    NODE *tripFactor = nullptr, *maxTrips = nullptr, *minTrips = nullptr; // ICONs, null before they are asked for
+    // PPRAGMA trees, null without.
+    NODE *mustIterate = nullptr, *probIterate = nullptr, *unrollPragma = nullptr, *unrollAmountPragma = nullptr;
+    NODE *loopNoAliasPragma = nullptr, *mmaLoopPragma = nullptr, *sourceLoopPragma = nullptr;
+    NODE *tripCntrMungedPragma = nullptr, *noAliasClonePragma = nullptr, *loopFlagsPragma = nullptr;
+    NODE *parallelLoopPragma = nullptr, *coalesceLoopPragma = nullptr, *noCoalesceLoopPragma = nullptr;
+    NODE *noNlcPragma = nullptr, *spConstraintPragma = nullptr, *iiEstimatePragma = nullptr;
+    NODE *unitResourcesPragma = nullptr, *spHindrancesPragma = nullptr, *readWritePragma = nullptr;
+    std::vector<NODE*> noAliasAdvice, aliasAdvice, alignAdvice, inlineAdvice;
+    std::vector<NODE*> givens; // conditions that hold throughout the loop; those of FUNINFO outlive the hierarchy
 
     LOOP() = default;
     LOOP(const LOOP&) = delete; // copies are deep: make_LOOP
@@ -223,19 +227,17 @@ void find_region_constants(struct LOOP* loop);
 bool sym_is_RC_in_loop(const SYMTAB* sym, const struct LOOP* loop);
 // With `lcvCounts` the loop's control variables count as invariant.
 bool tree_is_RC_in_loop(const NODE* tree, const struct LOOP* loop, bool lcvCounts);
-int expr_is_affine_in_loop(const NODE* tree, const struct LOOP* loop,
-                           bool strict); // -1 invariant, 1 of the control variable, 0 neither
-bool subscript_is_linear(const NODE* tree, struct LOOP* loop, bool onlyVLCV, DDEP* dep);
+// -1 invariant, 1 of the control variable, 0 neither.
+int expr_is_affine_in_loop(const NODE* tree, const struct LOOP* loop, bool strict);
 void make_sym_RC_in_loop(SYMTAB* sym, struct LOOP* loop);
 void make_sym_altered_in_loop(SYMTAB* sym, struct LOOP* loop);
 LOOPIV* alloc_LOOPIV(SYMTAB* sym, struct LOOP* loop); // at the end of the loop's records
 void delete_LOOPIV(LOOPIV* iv);
 LOOPIV* find_LOOPIV_for_IV(const SYMTAB* sym, const struct LOOP* loop, bool outer_too);
 LOOPLV* find_LOOPLV_for_LV(const SYMTAB* sym, struct LOOP* loop);
-struct LOOP* find_loop_for_LCV(const SYMTAB* sym,
-                               struct LOOP* loop); // the loop around or `loop` whose control variable it is
+// The loop around, or `loop`, whose control variable it is.
+struct LOOP* find_loop_for_LCV(const SYMTAB* sym, struct LOOP* loop);
 LOOPIV* find_LCV_for_loop(const struct LOOP* loop, uint64_t flags); // the record with one of the flags, or null
-SYMTAB* object_name_if_known(const NODE* tree, bool, bool);
 
 // ---- induction_variables.cpp
 
@@ -250,8 +252,8 @@ struct INDUCTION_UPDATE {
 };
 bool is_induction_update(const NODE* statement, INDUCTION_UPDATE* update);
 
-// In the head of a bottom-tested loop a statement says of an unsigned counter that was proved affine that it is: a later
-// build need not find the proof again. They go with the work on loops.
+// In the head of a bottom-tested loop a statement says of an unsigned counter that was proved affine that it is: a
+// later build need not find the proof again. They go with the work on loops.
 void insert_affine_marks(struct LOOP* root);
 void drop_affine_marks();
 void find_loop_IVs(struct LOOP* loop);

@@ -4,11 +4,11 @@
 // preheader; pragmas that stand there go to the record of the loop on the same walk.
 //
 // Needs: invariants of the loops; of those that are induction variables, their directions. Leaves: the same; pragmas
-// are taken out of the statements. Sound because a fact of values on entry reads invariants of the loop alone, and
-// nothing between it and the loop may change what it reads. An assertion in the head counts only where no call stands
-// ahead of it: the call may not return, and then the assertion says nothing of what was done before. One on a variable
-// that only grows, as v >= 3, also holds in the iterations that follow. Facts die with the hierarchy, for a later pass
-// may give a variable another meaning.
+// are taken out of the statements.
+// Sound because a fact of values on entry reads invariants of the loop alone, and nothing between it and the loop may
+// change what it reads. An assertion in the head counts only where no call stands ahead of it: the call may not return,
+// and then the assertion says nothing of what was done before. One on a variable that only grows, as v >= 3, also holds
+// in the iterations that follow. Facts die with the hierarchy, for a later pass may give a variable another meaning.
 
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"

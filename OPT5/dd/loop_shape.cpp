@@ -1,9 +1,9 @@
 // Loops with one back edge, a preheader and exit blocks of their own.
 //
 // Needs: no hierarchy. Leaves: numbered blocks, dominators and natural loops to be found anew where blocks were
-// inserted. Sound because only empty blocks are put on edges. A promise of iterations in front of a loop that becomes
-// two nested ones is true of neither, and goes. Edges of a dispatch of exceptions stay: the exception table names their
-// targets.
+// inserted.
+// Sound because only empty blocks are put on edges. A promise of iterations in front of a loop that becomes two nested
+// ones is true of neither and is removed. Edges of a dispatch of exceptions stay: the exception table names their targets.
 #include "OPT5/dd/loop_shape.h"
 
 #include "OPT5/dd/loop.h"

@@ -38,7 +38,7 @@ void delete_LOOPIV(LOOPIV* iv) {
     if (loop->LCV == iv) loop->LCV = nullptr;
     if (loop->VLCV == iv) loop->VLCV = nullptr;
     auto& all = loop->IVs;
-    // The last made goes most often.
+    // The last made is the most likely to be removed.
     auto it = std::find_if(all.rbegin(), all.rend(), [iv](const auto& p) { return p.get() == iv; });
     all.erase(std::next(it).base());
 }

@@ -42,7 +42,6 @@
 
 namespace {
 
-constexpr int DEEPEST = 8;          // levels of loops from the innermost; what is outside of them stays
 constexpr size_t MOST_POINTERS = 6; // of a loop: the target has eight address registers
 constexpr double STEP_COST = 2;     // a pointer's step becomes part of an access
 constexpr double COUNTER_COST = 3;  // a counter's step

@@ -6,11 +6,11 @@
 //
 // Needs: the marks of aliased objects.
 // Leaves: the same values, the same accesses, each as volatile and as aligned as it was. What a reference may meet is
-// asked in this form as in the other. Sound because a subscript is computed where it is exact: all partial sums are
-// differences of pointers into one object in a program without errors, so that they fit in the width of a pointer; in a
-// narrower or an unsigned type only what the simplifier proves not to wrap is summed up. `u + 65535u` as subscript of
-// an object is one term: widened term by term it would be another place. A term with effects stays where it is, so that
-// effects keep their order.
+// asked in this form as in the other.
+// Sound because a subscript is computed where it is exact: all partial sums are differences of pointers into one object
+// in a program without errors, so that they fit in the width of a pointer; in a narrower or an unsigned type only what
+// the simplifier proves not to wrap is summed up. `u + 65535u` as subscript of an object is one term: widened term by
+// term it would be another place. A term with effects stays where it is, so that effects keep their order.
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/alias.h"
@@ -33,7 +33,7 @@ namespace {
 
 bool is_integral(const TYPE* t) { return t->is_int() || t->is_enum(); }
 
-NODE* left_alone(NODE* t) { // the node goes, its left operand stays
+NODE* left_alone(NODE* t) { // the node is removed, its left operand stays
     NODE* left = t->left;
     erase_node(t);
     return left;
@@ -424,7 +424,7 @@ NODE* strip_ddep_info_from_tree(NODE* tree) {
 
 namespace {
 
-// The copy of a parameter into a volatile scalar: it goes to a variable of its own, which bears the parameter's name as
+// The copy of a parameter into a volatile scalar: it is made in a variable of its own, which bears the parameter's name as
 // the scalar does, and from there to the scalar.
 bool split_copy(NODE* copy, LIST* prolog) {
     if (copy->op != ASG || copy->left->op != NAME || !copy->left->type->is_scalar() || !copy->left->type->is_volatile())

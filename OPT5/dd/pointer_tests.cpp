@@ -5,8 +5,8 @@
 // Needs: loops and live variables. Leaves: those, but that the counter is dead.
 // Sound because counter and pointer each step once in each iteration, by constants, so that at the test that leaves the
 // pointer has come as many steps as the counter, or one more or less where only one of them steps ahead of the test. It
-// was at no earlier test where it is then: its steps are too few to come around. An unsigned counter may wrap on the way
-// to a limit that is met alone, so that its number of steps is no difference; but those where the limit is the last value
+// was at no earlier test where it is then: its steps are too few to wrap. An unsigned counter may wrap ahead of
+// a limit that is met alone, so that its number of steps is no difference; but those where the limit is the last value
 // that it can take.
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"

@@ -5,9 +5,9 @@
 // values the control variable has.
 //
 // Needs: `trips`, facts, the control variable. Leaves: `minTrips`, `maxTrips`, `tripFactor`; MUST_ITERATE and
-// PROB_ITERATE in step with them; `trips` as a constant where the bounds meet. Sound because a test or an assertion
-// ahead of the loop counts only if every path from it to the loop leaves N alone: in
-// `_nassert(n % 4 == 0); if (c) n++; for (i = 0; i < n; i++)` the arm is on no straight line, and still between the
+// PROB_ITERATE in step with them; `trips` as a constant where the bounds meet.
+// Sound because a test or an assertion ahead of the loop counts only if every path from it to the loop leaves N alone:
+// in `_nassert(n % 4 == 0); if (c) n++; for (i = 0; i < n; i++)` the arm is on no straight line, and still between the
 // two. A test counts only where the line comes through one side of it. Of a loop that may be left early the count is an
 // upper bound alone.
 

@@ -4,12 +4,12 @@
 // ends at a constant distance, as a constant; otherwise as a tree over invariants of the loop, to be read ahead of it.
 //
 // Needs: the control variable with its test, limit, step and value on entry; facts of the loop. Leaves: `trips`, and
-// the affine flags that are proved. Sound because differences are taken in a type that holds them: from -30000 to 30000
-// an int counter runs 60000 units. A counter that may wrap has no count but by exact arithmetic modulo its width, and
-// that only where it is unsigned: of `u <= n` with n = 65535 there is no end. A bottom-tested loop runs once whatever
-// its test says, so that its count is the formula's only where the test would also pass on entry. Where a loop may be
-// left before its test fails the formula is an upper bound; it is none if the test is `!=` and the limit may lie on the
-// other side of the start.
+// the affine flags that are proved.
+// Sound because differences are taken in a type that holds them: from -30000 to 30000 an int counter runs 60000 units.
+// A counter that may wrap has no count but by exact arithmetic modulo its width, and that only where it is unsigned: of
+// `u <= n` with n = 65535 there is no end. A bottom-tested loop runs once whatever its test says, so that its count is
+// the formula's only where the test would also pass on entry. Where a loop may be left before its test fails the
+// formula is an upper bound; it is none if the test is `!=` and the limit may lie on the other side of the start.
 
 #include "OPT5/dd/trip.h"
 

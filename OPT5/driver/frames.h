@@ -13,7 +13,7 @@ extern const FRAME DF;
 extern const FRAME D_where_loops_are;
 // Normal form alone.
 extern const FRAME N;
-// The same; behind it the hierarchy goes and the blocks are simplified.
+// The same; behind it the hierarchy is removed and the blocks are simplified.
 extern const FRAME N_and_no_hierarchy;
 
 // The form that the last row with a frame left for the next is undone: ahead of rows without one, and where the work on a

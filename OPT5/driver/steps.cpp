@@ -49,7 +49,7 @@ bool L2_with_branches_on_28() { return L2_with_branches() && cpu_version == 28; 
 bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
 // What such a row does is for loops alone: a function without needs not be brought into the form of its frame.
 bool L2_with_loops() { return L2() && has_loops(); }
-bool is_stack_shared() { return L1() || (float_support | 1) != 11; }
+bool is_stack_shared() { return L1() || !has_hardware_float(); }
 bool fusion_is_enabled() { return L2() && pass_enable_loop_fusion; }
 
 // ---- Actions that are more than a line
@@ -80,14 +80,6 @@ void set_call_graph_order() {
     for (SYMTAB* sym : in_work) waiting.insert(make_FUNINFO(sym));
     for (const FUNLIST* p = cg_list; p; p = p->next)
         if (waiting.erase(p->fun) && !is_left_out(p->fun)) functions.push_back(p->fun->symbol);
-}
-
-void print_scopes() {
-    if (!fdebug) return;
-    if (currfuninfo->ls_root)
-        currfuninfo->ls_root->print(fdebug);
-    else
-        debug_printf("<<NULL SCOPE>>\n");
 }
 
 void pass_2_inits() {

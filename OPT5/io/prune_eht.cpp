@@ -88,7 +88,7 @@ private:
         for (size_t i = 1; i < n; ++i)
             if (used[i]) new_ids[i] = ++count;
         if (count + 1 == n) return;
-        // Some stand in clean-up code that goes.
+        // Some stand in clean-up code that is removed.
         for (NODE* call : calls) call->set_eh_entry(new_ids[call->eh_entry()]);
         for (size_t i = 1; i < n; ++i) {
             if (!used[i]) {

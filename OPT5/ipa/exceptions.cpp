@@ -1,6 +1,6 @@
 // Exception tables under call integration.
 //
-// The table of the body goes behind that of the function, entry by entry. Entry 0 of a call, and entry 1 of a table that
+// The table of the body is put behind that of the function, entry by entry. Entry 0 of a call, and entry 1 of a table that
 // has it pass exceptions on, stand for what leaves the function: in the copy that is what the entry of the call says that
 // is expanded. Chains that end in the body go on there.
 //

@@ -234,3 +234,11 @@ LS* true_scope(const NODE* tree) {
     if (sym->scope) return sym->scope;
     return is_internal_symbol(sym) && root->first_child ? root->first_child : tree->ls;
 }
+
+void print_scopes() {
+    if (!fdebug) return;
+    if (currfuninfo->ls_root)
+        currfuninfo->ls_root->print(fdebug);
+    else
+        debug_printf("<<NULL SCOPE>>\n");
+}

@@ -91,3 +91,4 @@ PTR* find_or_make_PTR_entry(SYMTAB* sym, fkMDATA* member = nullptr);
 // Gives the copy of a pointer variable what is known of the variable, but for the group, which is built anew.
 void copy_PTR_entry(SYMTAB* to, SYMTAB* from);
 LS* true_scope(const NODE* tree);
+void print_scopes(); // of the current function, to the debug stream

@@ -79,7 +79,7 @@ NODE* make_swap(const NODE* a, const NODE* b) {
     return mk_MCALL("__swapf", maketree(COMMA, reference(a), reference(b), tp->int_t), tp->void_t);
 }
 
-bool target_swaps_floats() { return (float_support | 1) == 11 && cpu_version == 28 && find_BIF_descriptor("__swapf"); }
+bool target_swaps_floats() { return has_hardware_float() && cpu_version == 28 && find_BIF_descriptor("__swapf"); }
 
 // ---- Variables whose values reach nothing
 

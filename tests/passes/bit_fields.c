@@ -143,7 +143,7 @@ int looked_at(struct mode *p, struct mode *q) {
     return m.b;
 }
 
-// A mask goes that clears no bit of what any assignment gives the variables.
+// A mask is removed that clears no bit of what any assignment gives the variables.
 // FUNCTION: masked
 // COUNT 1: & 7
 // COUNT 1: & 31

@@ -30,7 +30,7 @@ float kept(float a, float b) {
     return a * t;
 }
 
-// What stood between them goes first.
+// What stood between them is removed first.
 // FUNCTION: no_exchange
 // COUNT 0: __swapf(
 // COUNT 0: unused = 

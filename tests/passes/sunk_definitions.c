@@ -38,7 +38,7 @@ int by_condition(int n) {
     return x;
 }
 
-// What it is computed from changes on the way to the exit: through a pointer, or in the step of the counter.
+// What it is computed from changes ahead of the exit: through a pointer, or in the step of the counter.
 int changes_behind(int *p, int *q) {
     int i = 0, x, y;
     do {

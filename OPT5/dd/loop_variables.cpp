@@ -318,10 +318,6 @@ private:
     std::map<SYMTAB*, LOOPLV, BY_UID> found;
 };
 
-bool is_in(const SYMTAB* sym, const struct LOOP* loop) {
-    return std::any_of(loop->LVs.begin(), loop->LVs.end(), [sym](const LOOPLV& lv) { return lv.sym == sym; });
-}
-
 void set_flags_of(LOOPLV& lv, struct LOOP* loop) {
     if (is_optimizer_temp(lv.sym->name, 'a', 'a')) {
         lv.flags = LV_dead_on_exit | LV_dead_on_entry;
@@ -333,12 +329,12 @@ void set_flags_of(LOOPLV& lv, struct LOOP* loop) {
         if (live_at_entry_is_known(loop->head) && !is_live_at_entry(loop->head, bit)) lv.flags |= LV_dead_on_entry;
     }
     auto* sym = lv.sym;
-    auto note = [&lv, sym](const struct LOOP* other) {
-        if (is_in(sym, other)) lv.flags |= LV_defined_elsewhere | LV_used_elsewhere;
+    auto note = [&lv, sym](struct LOOP* other) {
+        if (find_LOOPLV_for_LV(sym, other)) lv.flags |= LV_defined_elsewhere | LV_used_elsewhere;
         if (other->RC_syms.count(sym)) lv.flags |= LV_used_elsewhere;
     };
-    for (const struct LOOP* l = loop->parent; l && !l->is_root(); l = l->parent) note(l);
-    for (const struct LOOP* l : loops_outer_first(loop))
+    for (struct LOOP* l = loop->parent; l && !l->is_root(); l = l->parent) note(l);
+    for (struct LOOP* l : loops_outer_first(loop))
         if (l != loop) note(l);
 }
 

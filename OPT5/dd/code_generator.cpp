@@ -4,6 +4,7 @@
 // memory into the form of references, builds the hierarchy, and keeps of each loop what its record says. Layout
 // follows, so that the records are settled behind it (loop_records.cpp).
 #include "OPT5/dd/dd.h"
+#include "OPT5/dd/ssa.h"
 
 #include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"

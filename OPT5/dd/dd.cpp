@@ -1,13 +1,7 @@
 // Not built yet: the passes leave the program as it is, and every question is answered with "not known".
 #include "OPT5/dd/dd.h"
+#include "OPT5/dd/ssa.h"
 
-void construct_SSA_form(bool, bool, bool) {}
-void deconstruct_SSA_form() {}
-void clone_SSA_NASSERTs() {}
-void propagate_SSA_constants(int) {}
-void eliminate_dead_SSA_assignments() {}
-void hoist_SSA_region_constants() {}
-void promote_vars_to_registers(bool) {}
 void init_dependence_analysis() {}
 void wrapup_dependence_analysis(bool) {}
 void report_all_dependences() {}

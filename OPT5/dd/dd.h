@@ -20,15 +20,6 @@ void denormalize_unchanged_trees(); // of a step whose trees are simplified: wha
 // local without the qualifier takes the value.
 void split_qualified_parameter_copies();
 
-// SSA form of the current function and the passes on it.
-void construct_SSA_form(bool with_memory, bool with_fields, bool scalars_only);
-void deconstruct_SSA_form();
-void clone_SSA_NASSERTs();
-void propagate_SSA_constants(int mode);
-void eliminate_dead_SSA_assignments();
-void hoist_SSA_region_constants();
-void promote_vars_to_registers(bool with_assertions);
-
 // Dependence analysis is active between these two.
 void init_dependence_analysis();
 void wrapup_dependence_analysis(bool keep);

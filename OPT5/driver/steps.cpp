@@ -11,6 +11,7 @@
 #include "OPT5/cd/cd.h"
 #include "OPT5/cd/vectors.h"
 #include "OPT5/dd/dd.h"
+#include "OPT5/dd/ssa.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/dd/merge.h"
 #include "OPT5/ipa/inline.h"

@@ -14,10 +14,12 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <vector>
 
 class NODE;
 class SYMTAB;
 class SSAVAR;
+struct SSA_ARG;
 struct LIST;
 struct LS;
 class BBLK;
@@ -46,7 +48,7 @@ struct DDNODE_RECORD {
 struct RARE_FIELDS {
     double weight = -1.0;     // LABELREF profile weight, -1.0 for none
     intptr_t branch_hint = 0; // LABELREF: below zero unlikely, above zero likely
-    NODE* ssa_args = nullptr; // SSA_PHI
+    std::vector<SSA_ARG>* ssa_args = nullptr; // SSA_PHI, of the node, not of its copies; owned by the form
     DDNODE_RECORD* dd = nullptr; // of the node, not of its copies
 };
 
@@ -68,7 +70,7 @@ public:
         INT65
             lval; // ICON, LCON value; SCON length; LABELREF index; SKIP, SWITCH counts; CALL extra arguments; ASM kind
         struct {
-            uint64_t pad;
+            uint64_t version; // SSA definitions
             union {
                 void* rval;
                 SYMTAB* sym;      // NAME
@@ -86,7 +88,7 @@ public:
         char* text;     // SCON bytes, ASM text, FCON print form, NAME alternative name; owned
         PRAGMA* pragma; // PPRAGMA, owned
         CALL_RECORD* call; // CALL, UCALL; owned, null until the call sites are numbered
-        NODE* reach;    // SSA_USE; metavalue slot of SSA definitions
+        NODE* reach;    // SSA_USE, SSA_MU, SSA_CHI: the definition that reaches
     };
     LS* ls = nullptr; // source scope, null for none
 

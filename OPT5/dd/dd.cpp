@@ -18,4 +18,3 @@ void interleave_reductions_in_loop(struct LOOP*, bool) {}
 void explode_local_arrays() {}
 void special_DMAC_conversion() {}
 void rotate_loops_for_accumulators() {}
-void do_DVE_unit_testing() {}

@@ -2,9 +2,6 @@
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/ssa.h"
 
-void init_dependence_analysis() {}
-void wrapup_dependence_analysis(bool) {}
-void report_all_dependences() {}
 void report_ambiguous_aliases(struct LOOP*) {}
 void undeltafy_dd_loops(struct LOOP*) {}
 void collapse_dd_loops(struct LOOP*) {}

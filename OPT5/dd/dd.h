@@ -1,6 +1,8 @@
 // Loops: normal form, dependence, SSA form, and the transformations on loops. The hierarchy is in loop.h.
 #pragma once
 
+#include "OPT5/dd/dependence.h"
+
 class NODE;
 struct LOOP; // written out where it is used: an opcode has the same name
 
@@ -20,10 +22,6 @@ void denormalize_unchanged_trees(); // of a step whose trees are simplified: wha
 // local without the qualifier takes the value.
 void split_qualified_parameter_copies();
 
-// Dependence analysis is active between these two.
-void init_dependence_analysis();
-void wrapup_dependence_analysis(bool keep);
-void report_all_dependences();
 void report_ambiguous_aliases(struct LOOP* loop);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.

@@ -33,6 +33,7 @@ NODE* clone_node(const NODE* t) {
     if (!t->rare_m) return c;
     c->rare_m = new RARE_FIELDS(*t->rare_m);
     c->rare_m->dd = nullptr;
+    c->rare_m->dependence = nullptr;
     c->rare_m->ssa_args = nullptr;
     return c;
 }

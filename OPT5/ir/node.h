@@ -44,12 +44,21 @@ struct DDNODE_RECORD {
     uint16_t id = 0;
 };
 
+// What dependence analysis knows of a reference, a UMULT. Owned by the node.
+struct DDEPNODE {
+    BBLK* block;      // its `loop` is the reference's
+    NODE* root;       // the outermost STDOT above the node, or the node
+    NODE* normalized; // the form that is compared; null where that is the node itself. Owned
+    int32_t number;   // in the analysis, from 0
+};
+
 // What few nodes need: those with a profile, and those that an analysis of loops or of SSA form is at work on.
 struct RARE_FIELDS {
     double weight = -1.0;     // LABELREF profile weight, -1.0 for none
     intptr_t branch_hint = 0; // LABELREF: below zero unlikely, above zero likely
     std::vector<SSA_ARG>* ssa_args = nullptr; // SSA_PHI, of the node, not of its copies; owned by the form
     DDNODE_RECORD* dd = nullptr; // of the node, not of its copies
+    DDEPNODE* dependence = nullptr; // UMULT, of the node, not of its copies
 };
 
 // Where a call of the source stands. A copy keeps what the call was copied from.

@@ -32,7 +32,8 @@ public:
 
 private:
     const NODE* without_marks(const NODE* t) const override {
-        while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN) t = t->left;
+        while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || (t->op >= SSA_USE && t->op <= SSA_CHI))
+            t = t->left;
         return t;
     }
     bool takes_constant(const NODE*) override { return true; }

@@ -38,6 +38,8 @@ void propagate_PT_info(); // points-to sets of the current function's pointers
 extern bool file_symbols_are_known;
 bool file_symbol_may_be_aliased(const SYMTAB* sym); // reached other than by its name, as far as the program is known
 
+bool may_be_reached_by_pointers(const SYMTAB* sym); // true as well while the marks are not known
+
 // ---- Pairs
 // `exactN`: the lvalue is known to have that declared type, so that access as a character does not excuse it.
 bool types_may_be_aliased(TYPE* t1, bool exact1, TYPE* t2, bool exact2);

@@ -9,7 +9,6 @@ class NODE;
 class SYMTAB;
 
 bool marks_are_known();                             // of the current function
-bool may_be_reached_by_pointers(const SYMTAB* sym); // true as well while the marks are not known
 bool groups_are_known();                            // the groups of pointers, for the current function
 
 // How the pointer variables of a function get their values.

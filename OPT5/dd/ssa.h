@@ -104,11 +104,13 @@ void enter_ssa_definition(NODE* node, SSAVAR* variable, BBLK* block);
 inline bool op_is_SSA(int op) { return op >= SSA_PHI && op <= SSA_CHI; }
 inline bool op_is_SSA_definition(int op) { return op == SSA_PHI || op == SSA_DEF || op == SSA_CHI; }
 inline SSAVAR* ssa_variable(const NODE* t) { return t->u.ssa; }
+// The statement is simplified when the function leaves the form, or, in normal form, when its trees leave that.
+void note_changed_statement(LIST* cell);
 // Of a definition its own; of SSA_USE and SSA_MU that of the definition that they read.
 uint32_t ssa_version(const NODE* t);
 // SSA_USE, SSA_MU, SSA_CHI: the definition that reaches; null: the value on entry to the function.
 inline NODE* ssa_reach(const NODE* t) { return t->reach; }
-void set_ssa_reach(NODE* t, NODE* definition);
+inline void set_ssa_reach(NODE* t, NODE* definition) { t->reach = definition; }
 
 struct SSA_ARG {
     BBLK* block = nullptr;      // the predecessor

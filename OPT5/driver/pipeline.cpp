@@ -16,7 +16,7 @@
 
 namespace {
 
-register_option pass_debug_validate("debug:validate"), pass_debug_skip("debug:skip"), pass_debug_only("debug:only"),
+register_option pass_debug_skip("debug:skip"), pass_debug_only("debug:only"),
     pass_debug_list_rows("debug:list_rows"), pass_debug_idle_frames("debug:idle_frames");
 
 bool current_function_has_blocks() { return currfuninfo && currfuninfo->bb_list; }

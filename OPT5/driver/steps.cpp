@@ -11,9 +11,9 @@
 #include "OPT5/cd/cd.h"
 #include "OPT5/cd/vectors.h"
 #include "OPT5/dd/dd.h"
-#include "OPT5/dd/ssa.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/dd/merge.h"
+#include "OPT5/dd/ssa.h"
 #include "OPT5/ipa/inline.h"
 #include "OPT5/ipa/ipcp.h"
 #include "OPT5/ipa/progana.h"
@@ -138,17 +138,21 @@ void global_CSE() {
     clean_up_assert_RELOPs();
 }
 
-template <bool SCALARS_ONLY, class F>
+register_option pass_debug_bare_SSA("debug:bare_SSA"); // into SSA form and out of it, and no work on it
+
+template <bool VECTORS_TOO, class F>
 void in_SSA_form(F work) {
-    construct_SSA_form(false, false, SCALARS_ONLY);
-    work();
+    construct_SSA_form(false, false, VECTORS_TOO);
+    if (!pass_debug_bare_SSA) work();
     deconstruct_SSA_form();
 }
 
 // ---- Actions on loops
 
 // The root of the hierarchy, null without one.
-struct LOOP* root() { return currfuninfo->bb_list ? currfuninfo->bb_list->loop : nullptr; }
+struct LOOP* root() {
+    return currfuninfo->bb_list ? currfuninfo->bb_list->loop : nullptr;
+}
 
 template <class F>
 void with_hierarchy(F work) {

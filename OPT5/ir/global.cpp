@@ -40,7 +40,8 @@ bool do_int_MVP, do_IP_MVP, do_beta_MVP, trees_are_normalized, do_dd_for_be, eli
 bool any_unions_in_program;
 int lex = 0;
 
-register_option pass_debug_SIMD("debug:SIMD"), pass_debug_dump_serial("debug:dump_serial");
+register_option pass_debug_SIMD("debug:SIMD"), pass_debug_dump_serial("debug:dump_serial"),
+    pass_debug_validate("debug:validate");
 
 void reset_global_flags() {
     alias_vars_option = inline_single = dump_ocg_in_GDL = dwim_aliases = dwim_loops = far_externs = kr_flag = 0;

@@ -71,4 +71,4 @@ void reset_global_flags(); // the defaults
 void restore_global_flags();
 
 // ---- Switches that more than one room reads
-extern register_option pass_debug_SIMD, pass_debug_dump_serial;
+extern register_option pass_debug_SIMD, pass_debug_dump_serial, pass_debug_validate;

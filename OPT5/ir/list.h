@@ -13,7 +13,7 @@ struct LIST {
     NODE* first = nullptr;
     PSN* psn = nullptr;
     uint16_t flag1 = 0;
-    uint16_t flag2 = 0;
+    uint16_t flag2 = 0; // 1: changed in normal form, and to be simplified when the trees leave it
     LIST* rest = nullptr;
 
     static void* operator new(std::size_t size);

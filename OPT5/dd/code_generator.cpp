@@ -6,8 +6,8 @@
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/ssa.h"
 
-#include "BITVEC/bitvec.h"
 #include "OPT5/alias/alias.h"
+#include "OPT5/dd/dependence_graph.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
@@ -21,9 +21,6 @@
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/target.h"
-#include "UTIL/abort.h"
-
-#include <algorithm>
 
 namespace {
 
@@ -41,12 +38,11 @@ bool delete_NASSERTs() {
     return any;
 }
 
-// Copies of memory have no destinations to be wrapped on this target; pairs of clones that lost one, banks of memory,
-// and the dependence graph are not built yet.
+// Copies of memory have no destinations to be wrapped on this target, whose memory has no banks; pairs of clones that lost
+// one are not built yet.
 void wrap_memcpy_destinations() {}
 void unmark_singleton_clones(struct LOOP*) {}
 void write_dd_mbank_info() {}
-void write_dd_edges() {}
 
 // Deep sums keep the shape that the simplifier gave them.
 NODE* untower_tree(NODE* t) { return t; }
@@ -61,10 +57,12 @@ void denormalize_for_output(bool keep_ddnodes) {
 void find_records(struct LOOP* root) {
     wrap_memcpy_destinations();
     init_dependence_analysis();
+    DDGRAPH graph;
+    graph.build(root, !use_g2, use_g2 != 0);
     unmark_singleton_clones(root);
     write_loop_icode(root);
     write_dd_mbank_info();
-    write_dd_edges();
+    write_dd_edges(graph);
     wrapup_dependence_analysis(true);
 }
 
@@ -97,44 +95,6 @@ void do_dd_analysis_for_be() {
     changed(fact::graph);
     if (elim_dd_dead_assignments) remove_dead_assignments();
     do_dd_for_be = false;
-}
-
-// ---- Edges
-
-namespace {
-
-// The numbers of the accesses that still stand. A branch names labels alone on its right.
-BITVEC standing_accesses(const std::vector<CODE_EDGE>& edges) {
-    uint32_t largest = 0;
-    for (const CODE_EDGE& e : edges) largest = std::max({largest, e.from, e.to});
-    BITVEC standing(largest + 1);
-    for_each_tree(currfuninfo, [&](const NODE* tree) {
-        for_each_subtree(tree, [&](const NODE* t) {
-            if (t->op != DDNODE) return;
-            if (!t->rare().dd) optassert("tree->dval != NULL", __FILE__, __LINE__);
-            if (t->ddnode_id() <= largest) standing.set(t->ddnode_id());
-        });
-    });
-    return standing;
-}
-
-} // namespace
-
-void finalize_dd_edges() {
-    std::vector<CODE_EDGE>& edges = currfuninfo->code_records.edges;
-    if (edges.empty()) return;
-    const BITVEC standing = standing_accesses(edges);
-    std::vector<CODE_EDGE> kept;
-    for (CODE_EDGE& e : edges) {
-        if (standing.test(e.from) && standing.test(e.to)) {
-            kept.push_back(std::move(e));
-            continue;
-        }
-        debug_printf("\n\tDDEDGE from %d->%d omitted\n", e.from, e.to);
-        for (uint32_t id : {e.from, e.to})
-            if (!standing.test(id)) debug_printf("\t\tbecause DDNODE #%d is no longer present\n", id);
-    }
-    edges = std::move(kept);
 }
 
 void write_ldspec_advice() {}

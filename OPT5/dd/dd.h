@@ -41,11 +41,14 @@ void explode_local_arrays();
 void special_DMAC_conversion();
 void rotate_loops_for_accumulators();
 
-// What the code generator is told (code_generator.cpp, loop_records.cpp): FUNINFO::code_records. The analysis keeps what
-// the hierarchy knows of loops; what it says of them is settled when the blocks have their final order. Edges of accesses
-// that went are dropped.
+// What the code generator is told (code_generator.cpp, loop_records.cpp, dependence_records.cpp): FUNINFO::code_records.
+// The analysis keeps what the hierarchy knows of loops and of the dependences of accesses, which are numbered: DDNODE.
+// What is said of loops is settled when the blocks have their final order; accesses that are no longer in the loops that
+// they were found in lose their numbers then. Last, edges of accesses that went are dropped.
 void do_dd_analysis_for_be();
 void write_loop_icode(struct LOOP* root);
+class DDGRAPH;
+void write_dd_edges(const DDGRAPH& graph);
 void settle_loop_records();
 void finalize_dd_edges();
 void write_ldspec_advice();

@@ -14,9 +14,12 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
 
 #include <algorithm>
 #include <map>
+#include <set>
 #include <unordered_map>
 
 namespace {
@@ -36,6 +39,7 @@ CODE_LOOP record_of(const struct LOOP* loop) {
     CODE_LOOP r;
     r.id = uid_of(loop);
     r.outer = uid_of(loop->is_root() ? loop : loop->parent);
+    if (loop->head) r.head = loop->head->serial;
     r.flags = static_cast<uint16_t>(loop->flags & 254);
     if (loop->is_root()) {
         r.max = 1;
@@ -66,6 +70,7 @@ public:
         for (const NATURAL_LOOP* loop : loops) known.push_back(known_as(loop));
         for (uint32_t k : known)
             if (k != CODE_RECORDS::NOWHERE) ++takers[k];
+        drop_lost_numbers();
         write_down();
     }
 
@@ -109,12 +114,54 @@ private:
         return k;
     }
 
+    bool is_recognized(size_t i) const { return known[i] != CODE_RECORDS::NOWHERE && takers.at(known[i]) == 1; }
+
+    // An access keeps its number if all trees that bear it stand in the loops that the analysis found around it, each
+    // of which begins an iteration where it did: the distances of its vectors count those iterations.
+    void drop_lost_numbers() {
+        if (records.loop_of_access.size() < 2) return;
+        find_nests();
+        std::vector<bool> is_lost(records.loop_of_access.size());
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            const NATURAL_LOOP* around = loops.empty() ? nullptr : found.around(bb);
+            const uint32_t nest = around ? nest_of.at(around) : 0;
+            for (const LIST* s = bb->statements; s; s = s->rest)
+                for_each_subtree(s->first, [&](const NODE* t) {
+                    if (t->op == DDNODE && records.loop_of_access[t->ddnode_id()] != nest) is_lost[t->ddnode_id()] = true;
+                });
+        }
+        if (std::find(is_lost.begin(), is_lost.end(), true) == is_lost.end()) return;
+        const auto drop = [&](NODE* t) {
+            if (t->op != DDNODE || !is_lost[t->ddnode_id()]) return t;
+            NODE* access = t->left;
+            erase_node(t);
+            return access;
+        };
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (LIST* s = bb->statements; s; s = s->rest) s->first = rewrite_tree(s->first, drop);
+    }
+    // What each loop of the graph is of the hierarchy, if it and all around it are recognized; loops are ordered outer
+    // ones first.
+    void find_nests() {
+        std::set<unsigned> standing;
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) standing.insert(bb->serial);
+        for (size_t i = 0; i < loops.size(); ++i) {
+            const NATURAL_LOOP* loop = loops[i];
+            const uint32_t outer = loop->parent ? nest_of.at(loop->parent) : 0;
+            uint32_t& nest = nest_of[loop];
+            nest = CODE_RECORDS::NOWHERE;
+            if (!is_recognized(i) || records.loops[known[i]].outer != outer) continue;
+            const uint32_t head = records.loops[known[i]].head;
+            if (loop->header->serial == head || !standing.count(head)) nest = known[i];
+        }
+    }
+
     void write_down() {
         std::unordered_map<const NATURAL_LOOP*, uint32_t> id_of;
         std::vector<CODE_LOOP> told{records.loops[0]};
         for (size_t i = 0; i < loops.size(); ++i) {
             CODE_LOOP r;
-            if (known[i] != CODE_RECORDS::NOWHERE && takers[known[i]] == 1) r = records.loops[known[i]];
+            if (is_recognized(i)) r = records.loops[known[i]];
             r.id = static_cast<uint32_t>(i) + 1;
             r.outer = loops[i]->parent ? id_of.at(loops[i]->parent) : 0;
             id_of[loops[i]] = r.id;
@@ -135,6 +182,7 @@ private:
     std::vector<const NATURAL_LOOP*> loops; // outer ones first
     std::vector<uint32_t> known;            // by loop
     std::map<uint32_t, int> takers;
+    std::unordered_map<const NATURAL_LOOP*, uint32_t> nest_of; // NOWHERE of one that is not recognized
 };
 
 } // namespace

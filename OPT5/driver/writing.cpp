@@ -50,11 +50,11 @@ const ROW rows[] = {
     {F,     "unsimplify",             nullptr, is_written, unsimplify, none, graph},
     {IDLE,  "last disguise vectors",  nullptr, is_written, disguise_vector_operations, none, none},
     {FIXED, "machine state",          nullptr, is_written, strip_implicit_states, none, graph},
-    {IDLE,  "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
     {IDLE,  "vectors for output",     nullptr, is_written, [] { disclose_vector_operations(false); }, none, none},
     {FIXED, "prune exception table",  nullptr, is_written, prune_exception_table, none, graph},
     {F,     "profile",                nullptr, is_written, [] { initialize_CFG_profiling_annotation(true, true); }, none, graph},
     {F,     "loops for output",       nullptr, is_written, settle_loop_records, none, graph},
+    {IDLE,  "dependence edges",       nullptr, is_written, finalize_dd_edges, none, none},
 };
 // clang-format on
 

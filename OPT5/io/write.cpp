@@ -280,6 +280,9 @@ namespace {
 
 void write_code_records(const CODE_RECORDS& records) {
     for (const CODE_LOOP& l : records.loops) o_file->if_write_loop(l.id, l.outer, l.min, l.max, l.factor, l.flags);
+    uint32_t id = 0;
+    for (const CODE_VECTOR& v : records.vectors)
+        o_file->if_write_dep_vector(v.elements.data(), id++, v.flags, static_cast<uint32_t>(v.elements.size()));
     for (const CODE_EDGE& e : records.edges) o_file->if_write_dep_edge(e.from, e.to, e.vector);
 }
 

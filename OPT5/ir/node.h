@@ -41,7 +41,7 @@ struct DDNODE_RECORD {
     DDNODE_RECORD* next = nullptr;
     NODE* node = nullptr;
     NODE* copy = nullptr;
-    uint16_t id = 0;
+    uint32_t id = 0;
 };
 
 // What dependence analysis knows of a reference, a UMULT. Owned by the node.

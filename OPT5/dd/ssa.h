@@ -156,6 +156,8 @@ NODE* remove_SSA_operators_in_tree(NODE* t);              // consumes; null for 
 // ---- ssa_check.cpp
 int validate_SSA_form(); // what is wrong, to the debug stream or stderr; the number of findings
 void dump_SSA_function_body();
+// Into the form and out of it; a statement that is not what it was before ends the run.
+void enter_and_leave_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo);
 
 // ---- ssa_decorations.cpp: definitions for facts. Out of the form.
 // x = def$assert((x, IDENTITY(condition))) where the condition holds from there on, g = def$entry(g) for globals.

@@ -5,6 +5,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
+#include "UTIL/abort.h"
 
 #include <unordered_map>
 #include <unordered_set>
@@ -133,5 +134,24 @@ void dump_SSA_function_body() {
         debug_printf("%s:\n", bb->str());
         for (const LIST* s = bb->statements; s; s = s->rest)
             debug_printf("\t%s\n%s", stmt2infix(s->first).c_str(), text_of_operators(s->first).c_str());
+    }
+}
+
+void enter_and_leave_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo) {
+    std::vector<LIST*> before;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        promote_toplevel_COMMAOPs_in_list(bb->statements, bb->last_statement());
+        before.push_back(copy_statements(bb->statements));
+    }
+    construct_SSA_form(onlySSV, onlyIV, vectorsToo);
+    if (validate_SSA_form() != 0) abort_optimizer("SSA form is not valid");
+    deconstruct_SSA_form();
+    size_t i = 0;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink, ++i) {
+        const LIST* was = before[i];
+        for (const LIST* is = bb->statements; is || was; is = is->rest, was = was->rest)
+            if (!is || !was || stmt2infix(is->first) != stmt2infix(was->first))
+                abort_optimizer("SSA form has changed the function");
+        erase_tree_list(before[i]);
     }
 }

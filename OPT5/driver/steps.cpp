@@ -138,12 +138,13 @@ void global_CSE() {
     clean_up_assert_RELOPs();
 }
 
-register_option pass_debug_bare_SSA("debug:bare_SSA"); // into SSA form and out of it, and no work on it
+register_option pass_debug_bare_SSA("debug:bare_SSA"); // into SSA form and out of it, with no work on it
 
 template <bool VECTORS_TOO, class F>
 void in_SSA_form(F work) {
+    if (pass_debug_bare_SSA) return enter_and_leave_SSA_form(false, false, VECTORS_TOO);
     construct_SSA_form(false, false, VECTORS_TOO);
-    if (!pass_debug_bare_SSA) work();
+    work();
     deconstruct_SSA_form();
 }
 

@@ -53,20 +53,9 @@ bool is_defined_here(const SYMTAB* sym) {
 
 // ---- Flags
 
-uint64_t get_flags(FUNINFO* f) {
-    std::lock_guard<std::mutex> guard(f->flags_lock);
-    return f->flags;
-}
-
-void set_flags(FUNINFO* f, uint64_t bits) {
-    std::lock_guard<std::mutex> guard(f->flags_lock);
-    f->flags |= bits;
-}
-
-void clear_flags(FUNINFO* f, uint64_t bits) {
-    std::lock_guard<std::mutex> guard(f->flags_lock);
-    f->flags &= ~bits;
-}
+uint64_t get_flags(FUNINFO* f) { return f->flags; }
+void set_flags(FUNINFO* f, uint64_t bits) { f->flags |= bits; }
+void clear_flags(FUNINFO* f, uint64_t bits) { f->flags &= ~bits; }
 
 bool is_system_function(const char* name) { return system_functions().count(skip_name_prefix(name)) != 0; }
 
@@ -127,7 +116,8 @@ FUNINFO* find_FUNINFO(const char* name) {
 }
 
 FUNINFO* find_FUNINFO(SYMTAB* sym) {
-    std::lock_guard<std::mutex> guard(funinfo_lock);
+    std::unique_lock<std::mutex> guard(funinfo_lock, std::defer_lock);
+    if (max_threads > 0) guard.lock(); // every call in a tree is asked for
     auto it = funinfo_by_symbol.find(sym);
     return it == funinfo_by_symbol.end() ? nullptr : it->second;
 }

@@ -11,6 +11,7 @@
 #include "OPT5/ir/symtab.h"
 #include "TYPES/type.h"
 
+#include <atomic>
 #include <cstdint>
 #include <list>
 #include <map>
@@ -98,7 +99,6 @@ public:
     PSN *begin_psn = nullptr, *end_args_psn = nullptr, *end_locals_psn = nullptr, *end_psn = nullptr;
     std::vector<EHT_ITEM> eht;
     uint32_t scope_blocks = 0, scope_depth = 0;
-    std::mutex flags_lock; // guards every access to the flags; use the functions below
     uint32_t size = 0;     // integrable body size, 0: cannot be integrated
     CALLEE* cg_cursor = nullptr;
     const BITVEC* reach = nullptr; // borrowed
@@ -180,7 +180,7 @@ private:
     friend uint64_t get_flags(FUNINFO*);
     friend void set_flags(FUNINFO*, uint64_t);
     friend void clear_flags(FUNINFO*, uint64_t);
-    uint64_t flags = 0;
+    std::atomic<uint64_t> flags{0}; // read and changed by the functions below, from several workers
 };
 
 uint64_t get_flags(FUNINFO* f);

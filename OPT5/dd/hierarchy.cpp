@@ -8,6 +8,7 @@
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/dd/loop_shape.h"
+#include "OPT5/dd/ssa_data.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
@@ -275,6 +276,7 @@ bool find_tree(bool require_loops) {
 
 void find_symbols_and_variables(struct LOOP* root) {
     currfuninfo->has_nasserts = false;
+    if (aux_cmd_flag[3] && !do_dd_for_be) return find_SSA_loop_vars_and_assertions();
     find_region_constants(root);
     find_loop_assertions(nullptr);
     find_loop_IVs(root);

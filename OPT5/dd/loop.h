@@ -159,6 +159,7 @@ struct LOOP : LOOP_VALUES {
     LOOPIV* VLCV = nullptr; // of `IVs`: the count of iterations from 0
     std::vector<std::unique_ptr<LOOPIV>> IVs;
     std::unordered_map<const SYMTAB*, LOOPIV*> record_of; // those of `IVs`; looked up alone
+    std::unordered_map<const SYMTAB*, NODE*> rdefs; // definitions that reach the entry, while data is propagated in SSA form
     NODE* trips = nullptr;                                // executions of the tail for each entry; an ICON where exact
     NODE *tripFactor = nullptr, *maxTrips = nullptr, *minTrips = nullptr; // ICONs, null before they are asked for
     // PPRAGMA trees, null without.

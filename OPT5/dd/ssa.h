@@ -163,9 +163,6 @@ void enter_and_leave_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo);
 // x = def$assert((x, IDENTITY(condition))) where the condition holds from there on, g = def$entry(g) for globals.
 void insert_SSA_decoration_trees();
 void remove_SSA_decoration_trees();
-bool is_def_assert_ICALL_name(const char* name);
-bool is_def_entry_ICALL_name(const char* name);
-bool is_def_entry_ICALL_tree(const NODE* t);
 
 // ---- Passes on the form; each does nothing out of it. What they find is in the headers of the files.
 void propagate_SSA_constants(int passes);

@@ -16,20 +16,18 @@
 // the alias rules tell.
 #pragma once
 
+#include "OPT5/dd/dependence_vectors.h"
 #include "OPT5/ir/node.h"
 
 #include <cstdint>
 
 class BBLK;
-class DVE;
-class DDEP;
 struct LOOP;
 
 // ---- Life
-extern bool dependence_analysis_enabled;
-extern int virtual_init_count; // induction variables whose value on entry is taken to be 0 at the moment
+extern thread_local bool dependence_analysis_enabled;
 void init_dependence_analysis();         // of the current function, whose loop hierarchy must be there
-void redo_dependence_analysis(struct LOOP* loop); // the DDEPNODEs of the loop and of those in it are made anew
+void redo_dependence_analysis(struct LOOP* loop); // the DDEPNODEs are made anew after a change in the loop
 void wrapup_dependence_analysis(bool keep);       // `keep`: the DDEPNODEs stay with their nodes
 void flush_DDEPNODEs_for_loop(struct LOOP* loop); // and those in it
 void report_all_dependences();           // the references and their vectors, to the debug stream
@@ -38,16 +36,16 @@ void report_all_dependences();           // the references and their vectors, to
 DDEPNODE* get_DDEPNODE_from_tree(const NODE* tree);
 struct LOOP* get_loop_from_DDEPNODE_tree(const NODE* tree); // null without a record
 
-// ---- Vectors. Whoever gets a DDEP owns it (delete); null: independent.
+// ---- Vectors. Null: independent.
 // Of `v1`, evaluated in `l1`, and `v2` in `l2`. A distance of a level is the iteration of `v2` less that of `v1`, of the
 // loop of that level around both. `order`: above 0, `v1` comes first in one iteration; below, `v2`; 0: not known.
 // `*fwd` is the vector of dependences from `v1` to `v2`, made feasible in that order; `*bwd`, where `bwd` is not null,
 // of those from `v2` to `v1`. `assumeRC`: the caller vouches that the bases do not change between the two. `spec` above 0:
 // only the innermost `spec` loops are taken to carry a dependence.
-void compute_dependence_vectors(DDEP** fwd, DDEP** bwd, int order, const NODE* v1, struct LOOP* l1, const NODE* v2,
-                                struct LOOP* l2, bool assumeRC, int spec);
+void compute_dependence_vectors(DDEP_PTR* fwd, DDEP_PTR* bwd, int order, const NODE* v1, struct LOOP* l1,
+                                const NODE* v2, struct LOOP* l2, bool assumeRC, int spec);
 // The vector with the distances of both orders.
-DDEP* compute_full_dependence_vector(const NODE* v1, struct LOOP* l1, const NODE* v2, struct LOOP* l2);
+DDEP_PTR compute_full_dependence_vector(const NODE* v1, struct LOOP* l1, const NODE* v2, struct LOOP* l2);
 // Both in `loop` or in loops within: the distances at its level, dependences that outer loops carry left out.
 void compute_distances_for_loop(DVE* out, const NODE* v1, const NODE* v2, struct LOOP* loop);
 

@@ -79,7 +79,7 @@ void drop_hierarchy() {
 const FRAME D = {[] { begin(false); }, end};
 const FRAME D_with_dependence = {[] {
                                      begin(false);
-                                     init_dependence_analysis();
+                                     if (has_hierarchy()) init_dependence_analysis();
                                  },
                                  [] {
                                      wrapup_dependence_analysis(false);

@@ -166,6 +166,7 @@ void sink_definitions() {
 
 // Dependence analysis is active for as long as there is a hierarchy to collapse.
 void collapse_loops() {
+    if (!root()) return;
     init_dependence_analysis();
     collapse_dd_loops(root());
     wrapup_dependence_analysis(false);

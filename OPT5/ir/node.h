@@ -46,10 +46,11 @@ struct DDNODE_RECORD {
 
 // What dependence analysis knows of a reference, a UMULT. Owned by the node.
 struct DDEPNODE {
-    BBLK* block;      // its `loop` is the reference's
-    NODE* root;       // the outermost STDOT above the node, or the node
-    NODE* normalized; // the form that is compared; null where that is the node itself. Owned
-    int32_t number;   // in the analysis, from 0
+    BBLK* block = nullptr;      // its `loop` is the reference's
+    NODE* root = nullptr;       // the outermost STDOT above the node, or the node
+    NODE* normalized = nullptr; // the form that is compared; null where that is the node itself. Owned
+    int32_t number = 0;         // in the analysis, from 0
+    virtual ~DDEPNODE() = default;
 };
 
 // What few nodes need: those with a profile, and those that an analysis of loops or of SSA form is at work on.

@@ -156,10 +156,7 @@ static void drop_payload(NODE* t) {
         erase_tree(rare.dd->copy);
         delete rare.dd;
     }
-    if (rare.dependence) {
-        erase_tree(rare.dependence->normalized);
-        delete rare.dependence;
-    }
+    delete rare.dependence;
 }
 
 void erase_node(NODE* t) {

@@ -1,0 +1,554 @@
+// The form that references are compared in: an address as a sum of counts of iterations and of invariants.
+//
+// An induction variable stands for its value on entry to its loop, plus the step times the count of the loop's
+// iterations, plus what it was moved by in this iteration; a variable whose value is known at the reference stands for
+// that value; an invariant set ahead of the loop for what it was set to. What a loop is entered with and no tree says
+// is a value of its own (MIXVALUE).
+//
+// Needs: the loop hierarchy with its records, trees in normal form, marks of aliased objects.
+// Leaves: trees as they are; a record at each UMULT of the blocks of loops and of the function's body.
+// Sound because a NAME in the sum is fixed in the loops that are noted with it: what is in two sums stands for one value
+// while those iterate. A value known at the reference was assigned on all paths to it in the same iteration, and nothing
+// that it reads has been written since. Of a term that is read ahead of a loop each variable must be unchanged in that
+// loop; otherwise it is not the variable that is meant but the value that it had. An update of an induction variable
+// counts from its own statement on.
+#include "OPT5/dd/reference_form.h"
+
+#include "OPT5/alias/effects.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
+#include "OPT5/simp/exact.h"
+#include "OPT5/simp/simp.h"
+
+#include <algorithm>
+#include <map>
+#include <optional>
+#include <unordered_map>
+
+REFERENCE::~REFERENCE() {
+    erase_tree(normalized);
+    for (NODE* t : made) erase_tree(t);
+}
+
+namespace {
+
+constexpr int MOST_NODES = 96, MOST_DEPTH = 24, MOST_KNOWN = 32, MOST_LEVELS = 60;
+
+bool is_plain_integer(const TYPE* t) { return t->is_int() && !t->is_bool() && t->size <= 64; }
+bool same_integers(const TYPE* a, const TYPE* b) {
+    return is_plain_integer(a) && is_plain_integer(b) && a->size == b->size && a->is_unsigned() == b->is_unsigned();
+}
+bool same_numbers(const TYPE* a, const TYPE* b) {
+    return same_integers(a, b) || (a->is_pointer() && b->is_pointer() && a->size == b->size);
+}
+
+// ---- What is known at a point of the walk over a block
+
+struct ASSIGNED {
+    const SYMTAB* sym;
+    const NODE* value; // a part of the statement
+};
+
+struct POINT {
+    struct LOOP* loop = nullptr; // of the block
+    std::vector<ASSIGNED> known;
+    // By how much the block's loop has moved its induction variables in this iteration; nothing: by no constant.
+    std::map<const SYMTAB*, std::optional<WIDE>, BY_UID> moved;
+
+    const NODE* value_of(const SYMTAB* sym) const {
+        for (const ASSIGNED& a : known)
+            if (a.sym == sym) return a.value;
+        return nullptr;
+    }
+    void forget(const SYMTAB* sym) {
+        known.erase(std::remove_if(known.begin(), known.end(),
+                                   [sym](const ASSIGNED& a) { return a.sym == sym || sym_appears_in_tree(sym, a.value); }),
+                    known.end());
+    }
+    void forget_written(const NODE* tree, bool below_root) {
+        for_each_written_name(tree, [&](const NODE* name, const NODE* by) {
+            if (!below_root || by != tree) forget(name->u.sym);
+        });
+    }
+};
+
+// Computed from variables that only their names reach, and without effects.
+bool is_computed_from_variables(const NODE* t) {
+    return !any_subtree(t, [](const NODE* n) {
+        if (n->op == NAME) return !only_its_name_reaches(n->u.sym);
+        return op_has_effect(n->op) || op_is_call(n->op) || op_is_intrinsic(n->op) || n->op == UMULT || n->op == STREF ||
+               n->op == STDOT || n->op == UAND;
+    });
+}
+bool is_readable(const NODE* t) {
+    return t->op == ICON || (t->op == UAND && t->left->op == NAME) || is_computed_from_variables(t) ||
+           ((t->op == PLUS || t->op == MINUS) && is_readable(t->left) && is_readable(t->right)) ||
+           ((t->op == PCONV || t->op == ISP2CHAR) && is_readable(t->left));
+}
+
+// ---- The values that loops are entered with
+
+class ENTRY_VALUES {
+public:
+    NODE* make(const SYMTAB* sym, struct LOOP* loop) {
+        const auto [it, is_new] = numbers.try_emplace({sym, loop->uid}, FIRST + loops.size());
+        if (is_new) loops.push_back(loop);
+        NODE* t = new_node(MIXVALUE, sym->type->stqs());
+        t->u.rval = reinterpret_cast<void*>(it->second);
+        return t;
+    }
+    struct LOOP* loop_of(const NODE* mix) const { return loops[reinterpret_cast<uintptr_t>(mix->u.rval) - FIRST]; }
+
+private:
+    static constexpr uintptr_t FIRST = 2;
+    std::map<std::pair<const SYMTAB*, int>, uintptr_t> numbers; // looked up alone
+    std::vector<struct LOOP*> loops;
+};
+
+// ---- What loops keep
+
+class KEPT_VALUES {
+public:
+    struct LOOP* loop_counted_by(const SYMTAB* sym) const {
+        const auto it = counted.find(sym);
+        return it == counted.end() ? nullptr : it->second;
+    }
+    void enter(struct LOOP* loop) {
+        if (loop->VLCV) counted[loop->VLCV->sym] = loop;
+    }
+    // The outermost loop around that keeps the variable, or what memory holds; null: not even `loop` does.
+    struct LOOP* keeps_variable(const SYMTAB* sym, struct LOOP* loop) {
+        if (!sym || !(sym->sclass == SC_PARM || only_its_name_reaches(sym))) return nullptr;
+        struct LOOP* outermost = nullptr;
+        for (; loop && sym_is_RC_in_loop(sym, loop); loop = loop->parent) outermost = loop;
+        return outermost;
+    }
+    struct LOOP* keeps_memory(const NODE* read, struct LOOP* loop) {
+        struct LOOP* outermost = nullptr;
+        for (; loop && !changes(loop, read); loop = loop->parent) outermost = loop;
+        return outermost;
+    }
+
+private:
+    struct ANSWER {
+        NODE* read;
+        bool is_changed;
+    };
+    bool changes(struct LOOP* loop, const NODE* read) {
+        std::vector<ANSWER>& answers = asked[loop];
+        for (const ANSWER& a : answers)
+            if (trees_are_congruent(a.read, read, false)) return a.is_changed;
+        constexpr size_t MOST_ANSWERS = 32;
+        if (answers.size() >= MOST_ANSWERS) return true;
+        answers.push_back({copy_tree(read), writes(loop, read)});
+        return answers.back().is_changed;
+    }
+    bool writes(struct LOOP* loop, const NODE* read) {
+        for (BBLK* bb : loop->contents)
+            if (bb->loop == loop ? bb_modifies_lvalue_in_tree(bb, read) : changes(bb->loop, read)) return true;
+        return false;
+    }
+
+    std::unordered_map<const SYMTAB*, struct LOOP*> counted;     // looked up alone
+    std::unordered_map<const struct LOOP*, std::vector<ANSWER>> asked; // looked up alone
+
+public:
+    ~KEPT_VALUES() {
+        for (auto& [loop, answers] : asked)
+            for (ANSWER& a : answers) erase_tree(a.read);
+    }
+};
+
+// ---- The sum
+
+// Reads the address of one reference.
+class ADDRESS_READER final : public LINEAR_READER {
+public:
+    ADDRESS_READER(REFERENCE* r, const POINT& p, KEPT_VALUES& k, ENTRY_VALUES& e)
+        : LINEAR_READER(&r->sum, MOST_NODES), made(*r), point(p), kept(k), entries(e), loop(p.loop) {}
+
+    void read_address(const NODE* umult) {
+        LINEAR_FORM& sum = made.sum;
+        if (!read(umult->left, 1) || (umult->right && !read(umult->right, 1))) {
+            sum = LINEAR_FORM(ADDRESS_BITS);
+            sum.add(umult->left, 1);
+            if (umult->right) sum.add(umult->right, 1);
+        }
+        for (const LINEAR_FORM::TERM& t : sum) made.facts.push_back(facts_of(t.tree));
+    }
+
+private:
+    // ---- Operators
+
+    const NODE* without_marks(const NODE* t) const override {
+        while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN) t = t->left;
+        return t;
+    }
+    bool takes_constant(const NODE* icon) override { return is_plain_integer(icon->type) || icon->type->is_pointer(); }
+
+    bool opens(const NODE* t, const LINEAR_STEP& step) override {
+        if (t->type->is_pointer()) return opens_pointer(t, step);
+        if (!is_plain_integer(t->type) || t->op == NOTB || t->op == PCONV || t->op == ISP2CHAR) return false;
+        if (t->op == SCONV) return opens_cast(t);
+        if (t->op == PMCONV) // within an object
+            return is_plain_integer(t->left->type) && t->right->u.lval.value % ADDRESS_UNIT_BITS == 0;
+        if (!same_integers(step.a->type, t->type) || (step.b && !same_integers(step.b->type, t->type))) return false;
+        if (is_exact_by_rule(t->op, t->type) || operation_is_exact(t, loop)) return true;
+        if (t->type->size < ADDRESS_BITS) return false;
+        form.is_exact = false;
+        return true;
+    }
+    static bool opens_pointer(const NODE* t, const LINEAR_STEP& step) {
+        if (t->op == PCONV || t->op == ISP2CHAR) return t->left->type->is_pointer() && t->left->type->size == t->type->size;
+        if (t->op == MINUS) return step.a->type->is_pointer() && is_plain_integer(step.b->type);
+        return t->op == PLUS && step.a->type->is_pointer() != step.b->type->is_pointer();
+    }
+    bool opens_cast(const NODE* cast) {
+        const TYPE *from = cast->left->type, *to = cast->type;
+        if (!is_plain_integer(from)) return false;
+        if (from->size <= to->size && (from->is_unsigned() == to->is_unsigned() ||
+                                       (from->is_unsigned() && from->size < to->size)))
+            return true;
+        if (range_of_tree(cast->left, loop).is_within(range_of_type(to))) return true;
+        if (to->size < ADDRESS_BITS) return false;
+        form.is_exact = false;
+        return true;
+    }
+
+    // ---- Leaves
+
+    bool leaf(const NODE* t, int64_t k) override {
+        if (nodes_left < 0 || depth > MOST_DEPTH) return false;
+        if (t->op == UAND && t->type->is_pointer() && k == 1) return read_place(t->left);
+        if (t->op == NAME && is_readable_variable(t)) return variable(t, k);
+        if (t->op == MIXVALUE || !is_opened_inside(t)) return form.add(t, k);
+        return form.add(own(with_values(copy_tree(t))), k);
+    }
+    // The address of the place: of an object, or the pointer and what is added.
+    bool read_place(const NODE* place) {
+        int64_t bits = 0;
+        const NODE* object = place;
+        while (object->op == STDOT && object->right->mval && !object->right->mval->is_bitfld) {
+            bits += static_cast<int64_t>(object->right->mval->offset);
+            object = object->left;
+        }
+        if (bits % ADDRESS_UNIT_BITS || (object->op != NAME && object->op != UMULT))
+            return form.add(own(maketree(UAND, copy_tree(place), nullptr, tp->mk_ptr(place->type))), 1);
+        form.add_constant(bits / ADDRESS_UNIT_BITS);
+        if (object->op == UMULT) return read(object->left, 1) && (!object->right || read(object->right, 1));
+        return form.add(own(maketree(UAND, mk_NAME(object->u.sym), nullptr, tp->mk_ptr(tp->void_t))), 1);
+    }
+    bool is_readable_variable(const NODE* t) const {
+        return t->u.sym && same_numbers(t->type, t->u.sym->type) && !kept.loop_counted_by(t->u.sym) &&
+               (t->u.sym->sclass == SC_PARM || only_its_name_reaches(t->u.sym));
+    }
+
+    bool variable(const NODE* t, int64_t k) {
+        const SYMTAB* sym = t->u.sym;
+        if (entered && !sym_is_RC_in_loop(sym, entered)) return form.add(own(entry_value(sym, entered)), k);
+        if (const NODE* value = entered ? nullptr : point.value_of(sym))
+            if (same_numbers(value->type, t->type) && is_readable(value)) return at_depth([&] { return read(value, k); });
+        if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, true))
+            if (is_affine(iv)) return induction(iv, k);
+        if (const LOOPIV* rc = record_of_invariant(sym))
+            return at_entry(rc->loop, [&] { return read(rc->init, k); });
+        return form.add(t, k);
+    }
+    const LOOPIV* record_of_invariant(const SYMTAB* sym) const {
+        for (struct LOOP* l = loop; l && sym_is_RC_in_loop(sym, l); l = l->parent)
+            if (auto it = l->record_of.find(sym); it != l->record_of.end() && it->second->has(IV_is_RC))
+                return it->second->init && same_numbers(it->second->init->type, sym->type) && !l->is_root() &&
+                               is_readable(it->second->init)
+                           ? it->second
+                           : nullptr;
+        return nullptr;
+    }
+
+    // ---- Induction variables
+
+    // What the loop has added in this iteration; nothing: that is not known.
+    std::optional<WIDE> moved_by(const LOOPIV* iv) const {
+        if (iv->loop == point.loop && !entered) {
+            const auto it = point.moved.find(iv->sym);
+            return it == point.moved.end() ? WIDE(0) : it->second;
+        }
+        return moved_in_head(iv); // the point is in a loop within, or ahead of one
+    }
+    static std::optional<WIDE> moved_in_head(const LOOPIV* iv);
+    bool is_affine(const LOOPIV* iv) const {
+        return iv->has(IV_affine) && iv->loop->VLCV && iv->incrtree && iv->incrtree->op == ICON && moved_by(iv);
+    }
+    static int64_t step_of(const LOOPIV* iv) {
+        return static_cast<int64_t>(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type).value);
+    }
+
+    bool induction(const LOOPIV* iv, int64_t k) {
+        form.add_constant(form.reduced(WIDE(k) * *moved_by(iv)));
+        if (!form.add(own(mk_NAME(iv->loop->VLCV->sym)), form.reduced(WIDE(k) * step_of(iv)))) return false;
+        if (const NODE* init = readable_init(iv)) {
+            if (init->op == ICON) {
+                form.is_exact = form.is_exact && is_signed_number(init, iv->sym->type);
+                form.add_constant(form.reduced(WIDE(k) * number(init, iv->sym->type)));
+                return true;
+            }
+            return at_entry(iv->loop, [&] { return read(init, k); });
+        }
+        return form.add(own(entry_value(iv->sym, iv->loop)), k);
+    }
+    static const NODE* readable_init(const LOOPIV* iv) {
+        const NODE* init = iv->init;
+        if (!init) return nullptr;
+        if (init->op == ICON && is_plain_integer(init->type)) return init;
+        return same_numbers(init->type, iv->sym->type) && is_readable(init) ? init : nullptr;
+    }
+    static bool is_signed_number(const NODE* icon, TYPE* type) {
+        return truncate_to_type(icon->u.lval, type).fits<int64_t>();
+    }
+    static int64_t number(const NODE* icon, TYPE* type) {
+        return static_cast<int64_t>(truncate_to_type(icon->u.lval, type).value);
+    }
+
+    // ---- Terms that are no sums
+
+    static bool is_opened_inside(const NODE* t) {
+        return any_subtree(t, [](const NODE* n) { return n->op == NAME; }) && !tree_has_side_effects(t);
+    }
+    // The induction variables in it by the counts of iterations, so that it can be told what it depends on.
+    NODE* with_values(NODE* t) {
+        if (t->op == UAND) return t;
+        if (t->op == NAME) return value_in_term(t);
+        if (t->left) t->left = with_values(t->left);
+        if (t->right) t->right = with_values(t->right);
+        return t;
+    }
+    NODE* value_in_term(NODE* name) {
+        if (!is_readable_variable(name)) return name;
+        const SYMTAB* sym = name->u.sym;
+        NODE* value = nullptr;
+        if (entered && !sym_is_RC_in_loop(sym, entered))
+            value = entry_value(sym, entered);
+        else if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, true); iv && is_affine(iv))
+            value = induction_in_term(iv);
+        if (!value) return name;
+        value = coerce_to_type(name->type->stqs(), value);
+        erase_tree(name);
+        return value;
+    }
+    NODE* induction_in_term(const LOOPIV* iv) {
+        TYPE* type = iv->sym->type->is_pointer() ? iv->sym->type->stqs() : tp->long_t;
+        NODE* moved = maketree(MULT, mk_NAME(iv->loop->VLCV->sym), mk_ICON(INT65(step_of(iv)), tp->long_t), tp->long_t);
+        moved = maketree(PLUS, moved, mk_ICON(to_int65(*moved_by(iv)), tp->long_t), tp->long_t);
+        NODE* start = iv->init && iv->init->op == ICON && !iv->sym->type->is_pointer()
+                          ? mk_ICON(INT65(number(iv->init, iv->sym->type)), tp->long_t)
+                          : coerce_to_type(type, entry_value(iv->sym, iv->loop));
+        return maketree(PLUS, start, moved, type);
+    }
+
+    NODE* entry_value(const SYMTAB* sym, struct LOOP* of) { return entries.make(sym, of); }
+    NODE* own(NODE* t) {
+        made.made.push_back(t);
+        return t;
+    }
+
+    // ---- Where a value is read
+
+    template <class F>
+    bool at_depth(const F& work) {
+        ++depth;
+        const bool done = work();
+        --depth;
+        return done;
+    }
+    // Ahead of the loop, in terms of what that keeps.
+    template <class F>
+    bool at_entry(struct LOOP* of, const F& work) {
+        struct LOOP *outer_entered = entered, *outer_loop = loop;
+        entered = of;
+        loop = of->parent;
+        const bool done = at_depth(work);
+        entered = outer_entered;
+        loop = outer_loop;
+        return done;
+    }
+
+    // ---- What is known of a term
+
+    TERM_FACTS facts_of(const NODE* t) {
+        TERM_FACTS f;
+        if (t->op == NAME && (f.counts = kept.loop_counted_by(t->u.sym))) return f;
+        f.fixed_in = point.loop;
+        while (f.fixed_in->parent) f.fixed_in = f.fixed_in->parent;
+        restrict_by(t, &f);
+        if (is_plain_integer(t->type)) {
+            f.range = bounds_of_term(t);
+            f.is_bounded = true;
+        }
+        return f;
+    }
+    // The names in a term that was read ahead of a loop have the same values in it.
+    RANGE bounds_of_term(const NODE* t) const {
+        const bool has_counts = any_subtree(t, [this](const NODE* n) {
+            return n->op == MIXVALUE || (n->op == NAME && kept.loop_counted_by(n->u.sym));
+        });
+        return has_counts ? range_of_type(t->type) : range_of_tree(t, point.loop);
+    }
+    void restrict_by(const NODE* t, TERM_FACTS* f) {
+        for (; t && f->fixed_in; t = t->left) {
+            if (t->op == NAME) {
+                if (struct LOOP* counted = kept.loop_counted_by(t->u.sym))
+                    f->levels |= counted->level < MOST_LEVELS ? uint64_t(1) << counted->level : no_level(f);
+                else
+                    restrict_to(kept.keeps_variable(t->u.sym, point.loop), f);
+                return;
+            }
+            if (t->op == MIXVALUE) return restrict_to(entries.loop_of(t), f);
+            if (t->op == UAND && name_of_place(t->left)) return;
+            if (op_has_effect(t->op) || op_is_call(t->op) || t->op == STDOT || t->op == STREF) return restrict_to(nullptr, f);
+            if (t->op == UMULT) {
+                const bool can_be_asked = !lvalue_is_volatile(t) && !any_subtree(t, [this](const NODE* n) {
+                    return n->op == MIXVALUE || (n->op == NAME && kept.loop_counted_by(n->u.sym));
+                });
+                restrict_to(can_be_asked ? kept.keeps_memory(t, point.loop) : nullptr, f);
+            }
+            restrict_by(t->right, f);
+        }
+    }
+    static uint64_t no_level(TERM_FACTS* f) {
+        f->fixed_in = nullptr;
+        return 0;
+    }
+    static void restrict_to(struct LOOP* to, TERM_FACTS* f) {
+        if (!f->fixed_in || !to)
+            f->fixed_in = nullptr;
+        else if (to->level > f->fixed_in->level)
+            f->fixed_in = to;
+    }
+
+    REFERENCE& made;
+    const POINT& point;
+    KEPT_VALUES& kept;
+    ENTRY_VALUES& entries;
+    struct LOOP* loop;              // that the tree being read stands in
+    struct LOOP* entered = nullptr; // it is read ahead of this one; null: at the point
+    int depth = 0;
+};
+
+// The signed number that an update adds, or nothing.
+std::optional<WIDE> amount_of(const INDUCTION_UPDATE& u) {
+    if (u.amount->op != ICON) return std::nullopt;
+    INT65 v = u.amount->u.lval;
+    if (!u.sym->type->is_pointer() && u.sym->type->is_unsigned()) v = sign_extend_by_type_size(v, u.sym->type);
+    return u.is_subtracted ? -to_wide(v) : to_wide(v);
+}
+
+// Enters a statement that moves an induction variable of its loop.
+void enter_update(const NODE* statement, POINT* p) {
+    INDUCTION_UPDATE u;
+    if (!is_induction_update(statement, &u) || !find_LOOPIV_for_IV(u.sym, p->loop, false)) return;
+    std::optional<WIDE>& moved = p->moved.try_emplace(u.sym, WIDE(0)).first->second;
+    const auto amount = amount_of(u);
+    moved = moved && amount ? std::optional<WIDE>(*moved + *amount) : std::nullopt;
+}
+
+void enter_updates_of_head(POINT* p) {
+    for (const LIST* s = p->loop->head->statements; s; s = s->rest) enter_update(s->first, p);
+}
+
+std::optional<WIDE> ADDRESS_READER::moved_in_head(const LOOPIV* iv) {
+    POINT p;
+    p.loop = iv->loop;
+    enter_updates_of_head(&p);
+    const auto it = p.moved.find(iv->sym);
+    return it == p.moved.end() ? WIDE(0) : it->second;
+}
+
+// ---- The walk
+
+class WALK {
+public:
+    explicit WALK(struct LOOP* r) : root(r) {}
+
+    void run() {
+        for (struct LOOP* l : loops_outer_first(root)) {
+            kept.enter(l);
+            for (BBLK* bb : l->contents)
+                if (bb->loop == l) blocks.push_back(bb);
+        }
+        std::sort(blocks.begin(), blocks.end(), [](const BBLK* a, const BBLK* b) { return a->dfn < b->dfn; });
+        for (BBLK* bb : blocks) walk(bb);
+    }
+
+private:
+    void walk(BBLK* bb) {
+        POINT point;
+        point.loop = bb->loop;
+        if (bb->predecessors && !bb->predecessors->rest)
+            if (auto it = at_end.find(bb->predecessors->first); it != at_end.end()) point.known = it->second;
+        if (!bb->loop->is_root()) {
+            if (bb != bb->loop->head) enter_updates_of_head(&point);
+            enter_irregular_updates(&point);
+        }
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            const NODE* t = s->first;
+            if (tree_is_arg_prolog(t)) continue;
+            point.forget_written(t, true);
+            visit(s->first, nullptr, bb, point);
+            point.forget_written(t, false);
+            if (!bb->loop->is_root()) enter_update(t, &point);
+            enter_assignment(t, &point);
+        }
+        if (!point.known.empty()) at_end[bb] = std::move(point.known);
+    }
+    // Those of pointers that step in one arm or the other: at which points they have stepped is not asked.
+    void enter_irregular_updates(POINT* p) {
+        if (!do_dd_for_be) return;
+        for (BBLK* bb : p->loop->contents) {
+            if (bb->loop != p->loop || bb == p->loop->head || bb == p->loop->tail) continue;
+            for (const LIST* s = bb->statements; s; s = s->rest) {
+                INDUCTION_UPDATE u;
+                if (is_induction_update(s->first, &u) && find_LOOPIV_for_IV(u.sym, p->loop, false))
+                    p->moved[u.sym] = std::nullopt;
+            }
+        }
+    }
+    static void enter_assignment(const NODE* t, POINT* p) {
+        if (t->op != ASG || t->left->op != NAME || p->known.size() >= MOST_KNOWN) return;
+        const SYMTAB* sym = t->left->u.sym;
+        if (!sym || !only_its_name_reaches(sym) || !same_numbers(t->left->type, sym->type)) return;
+        if (!same_numbers(t->right->type, sym->type) || !is_readable(t->right) || sym_appears_in_tree(sym, t->right)) return;
+        p->known.push_back({sym, t->right});
+    }
+
+    // `above`: the outermost STDOT of those that the tree stands directly below, or null.
+    void visit(NODE* t, NODE* above, BBLK* bb, const POINT& point) {
+        if (!t) return;
+        if (t->op == STDOT) return visit(t->left, above ? above : t, bb, point);
+        visit(t->left, nullptr, bb, point);
+        visit(t->right, nullptr, bb, point);
+        if (t->op == UMULT && t->left->type->is_pointer()) make(t, above ? above : t, bb, point);
+    }
+    void make(NODE* umult, NODE* outermost, BBLK* bb, const POINT& point) {
+        auto* r = new REFERENCE;
+        r->block = bb;
+        r->root = outermost;
+        r->number = number++;
+        ADDRESS_READER(r, point, kept, entries).read_address(umult);
+        delete umult->rare().dependence;
+        umult->make_rare().dependence = r;
+    }
+
+    struct LOOP* root;
+    int32_t number = 0;
+    std::vector<BBLK*> blocks;
+    KEPT_VALUES kept;
+    ENTRY_VALUES entries;
+    std::unordered_map<const BBLK*, std::vector<ASSIGNED>> at_end; // looked up alone
+};
+
+} // namespace
+
+void make_references(struct LOOP* root) { WALK(root).run(); }

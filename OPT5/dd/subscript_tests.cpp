@@ -1,0 +1,353 @@
+// At which distances two addresses can be equal: one linear equation in the iterations of both references.
+//
+//     a1*x1 + a2*x2 + ... + u - (b1*y1 + b2*y2 + ... + w) = e
+//
+// x and y are the counts of iterations of the loops around the first and the second reference, u and w values that do
+// not change, or that nothing but their bounds is known of, and e runs through the differences at which two accesses
+// of their widths overlap. Values that both sides have in common cancel where they are fixed between the two.
+//
+// For each level, each distance d in its set is put to the test: with y = x + d there must be a solution by the greatest
+// common divisor of the coefficients, and by the least and the greatest value that the left side takes over the counts
+// that the loops have and the distances that the other levels still have. With one level and nothing unknown this is
+// exact: it decides equal coefficients (one distance), a coefficient of 0 on one side (one iteration), opposite ones
+// (distances of one parity) and all others alike. With more levels what one level loses narrows the next.
+//
+// Sound because both conditions are necessary ones of the equation over the integers, and a distance goes only where
+// they fail for every e. All of it is computed in 128 bits, in which nothing here overflows: coefficients have 33 bits,
+// counts 64, and there are at most 64 terms. Of sums that may wrap at the width of an address the equation holds modulo
+// that, which is one more unknown.
+#include "OPT5/dd/reference_form.h"
+
+#include "OPT5/ir/trees.h"
+
+#include <algorithm>
+#include <array>
+
+struct LOOP* loop_of_level(struct LOOP* loop, int level) {
+    while (loop->level > level) loop = loop->parent;
+    return loop;
+}
+
+// The count of an iteration that is left before its tail is one more than those that are executed to their ends.
+WIDE last_iteration(const struct LOOP* loop) {
+    if (!loop->maxTrips || loop->maxTrips->op != ICON || loop->maxTrips->u.lval >= no_trip_bound()) return NO_LAST;
+    const WIDE most = to_wide(loop->maxTrips->u.lval);
+    const bool ends_at_tail = loop->is_bottom_tested() && !loop->has(LOOP_early_exit);
+    return std::max<WIDE>(0, ends_at_tail ? most - 1 : most);
+}
+
+namespace {
+
+constexpr WIDE FAR = NO_LAST; // of a bound: none
+constexpr int MOST_DIFFERENCES = 64, MOST_ROUNDS = 3;
+
+WIDE gcd_of(WIDE a, WIDE b) {
+    a = a < 0 ? -a : a;
+    b = b < 0 ? -b : b;
+    while (b) {
+        const WIDE r = a % b;
+        a = b;
+        b = r;
+    }
+    return a;
+}
+
+// What a sum can be: `constant` plus a multiple of `step` (0: nothing), within bounds.
+struct SPAN {
+    WIDE constant = 0, step = 0;
+    WIDE min = 0, max = 0;
+    bool has_min = true, has_max = true;
+
+    void add_constant(WIDE v) {
+        constant += v;
+        min += v;
+        max += v;
+    }
+    // A multiple of what lies between `low` and `high`, FAR for no bound.
+    void add_multiple(WIDE k, WIDE low, WIDE high) {
+        if (k == 0) return;
+        if (low == high) return add_constant(k * low);
+        step = gcd_of(step, k);
+        add_end(k, k > 0 ? low : high, &min, &has_min);
+        add_end(k, k > 0 ? high : low, &max, &has_max);
+    }
+    // The values at corners of an area, and the directions in which it has no end.
+    void add_area(const std::vector<WIDE>& corners, const std::vector<WIDE>& directions) {
+        min += *std::min_element(corners.begin(), corners.end());
+        max += *std::max_element(corners.begin(), corners.end());
+        for (WIDE d : directions) {
+            has_min = has_min && d >= 0;
+            has_max = has_max && d <= 0;
+        }
+    }
+    bool may_be(WIDE v) const {
+        if (step ? (v - constant) % step != 0 : v != constant) return false;
+        return !(has_min && v < min) && !(has_max && v > max);
+    }
+
+private:
+    static void add_end(WIDE k, WIDE at, WIDE* sum, bool* has) {
+        if (at >= FAR || at <= -FAR)
+            *has = false;
+        else
+            *sum += k * at;
+    }
+};
+
+struct DISTANCES {
+    WIDE low, high; // FAR, -FAR: beyond all
+    bool is_zero() const { return low == 0 && high == 0; }
+};
+
+DISTANCES hull_of(const DVE& v) {
+    DISTANCES d{FAR, -FAR};
+    auto hold = [&d](WIDE low, WIDE high) {
+        d.low = std::min(d.low, low);
+        d.high = std::max(d.high, high);
+    };
+    if (v.overflow_low) hold(-FAR, -DVE::LIMIT - 1);
+    if (v.overflow_high) hold(DVE::LIMIT + 1, FAR);
+    if (v.same) hold(0, 0);
+    for (int k = 1; k <= DVE::LIMIT; ++k) {
+        if (v.bwd >> (k - 1) & 1) hold(-k, -k);
+        if (v.fwd >> (k - 1) & 1) hold(k, k);
+    }
+    return d;
+}
+
+// The counts of one loop in the equation: a*x - b*y.
+struct LEVEL_TERM {
+    WIDE a = 0, b = 0, last = NO_LAST;
+    bool is_there() const { return a != 0 || b != 0; }
+
+    // Adds what it can be at these distances; false where there are no such iterations.
+    bool add_to(SPAN* s, DISTANCES d) const {
+        if (last < FAR) d = {std::max(d.low, -last), std::min(d.high, last)};
+        if (d.low > d.high) return false;
+        if (!is_there()) return true;
+        if (d.low == d.high) {
+            s->add_constant(-b * d.low);
+            s->add_multiple(a - b, first_x(d.low), last_x(d.low));
+            return true;
+        }
+        std::vector<WIDE> corners, directions;
+        auto corner = [&](WIDE x, WIDE y) {
+            if (y - x >= d.low && y - x <= d.high) corners.push_back(a * x - b * y);
+        };
+        for (WIDE at : {d.low, d.high}) {
+            if (at <= -FAR || at >= FAR) continue;
+            corner(first_x(at), first_x(at) + at);
+            if (last < FAR) corner(last_x(at), last_x(at) + at);
+        }
+        corner(0, 0);
+        if (last < FAR) {
+            corner(last, last);
+            corner(0, last);
+            corner(last, 0);
+        } else {
+            directions.push_back(a - b);
+            if (d.high >= FAR) directions.push_back(-b);
+            if (d.low <= -FAR) directions.push_back(a);
+        }
+        s->step = gcd_of(gcd_of(s->step, a), b);
+        s->add_area(corners, directions);
+        return true;
+    }
+
+private:
+    static WIDE first_x(WIDE distance) { return distance < 0 ? -distance : 0; }
+    WIDE last_x(WIDE distance) const { return last >= FAR ? FAR : distance > 0 ? last - distance : last; }
+};
+
+// A value that only its bounds are known of, times a number.
+struct UNKNOWN {
+    WIDE by, low, high;
+};
+// A value computed from counts that both sides have: of the same iterations of its loops they are equal.
+struct PAIR {
+    UNKNOWN a, b;
+    uint64_t levels;
+};
+
+class EQUATION {
+public:
+    EQUATION(const REFERENCE& x, const REFERENCE& y, struct LOOP* c, struct LOOP* in, bool fixed_pointers)
+        : common(c), fixed(in), pointersAreFixed(fixed_pointers), levels(static_cast<size_t>(c->level) + 1) {
+        for (struct LOOP* l = common; l; l = l->parent) levels[static_cast<size_t>(l->level)].last = last_iteration(l);
+        enter(x, y);
+        constant = WIDE(x.sum.constant) - y.sum.constant;
+        if (!x.sum.is_exact || !y.sum.is_exact) unknowns.push_back({WIDE(1) << ADDRESS_BITS, -FAR, FAR});
+    }
+
+    // The sum may be `low` to `high`, not just a number.
+    void add_slack(int64_t low, int64_t high) { unknowns.push_back({-1, low, high}); }
+
+    // Null where the left side is never `e`.
+    DDEP_PTR narrowed(const DDEP& v, WIDE e) const {
+        if (!may_be(e, v, 0, {0, 0})) return nullptr;
+        auto left = std::make_unique<DDEP>(v);
+        const int alone = only_level();
+        if (alone > 0 && levels[static_cast<size_t>(alone)].a == levels[static_cast<size_t>(alone)].b)
+            return with_one_distance(std::move(left), alone, e);
+        for (int round = 0; round < MOST_ROUNDS; ++round) {
+            bool any = false;
+            for (int k = 1; k < left->count(); ++k) {
+                if (!is_concerned(k)) continue;
+                if (!narrow_level(left.get(), k, e, &any)) return nullptr;
+            }
+            if (!any || only_level() > 0) break;
+        }
+        return left;
+    }
+
+private:
+    // ---- Setting up
+
+    bool is_fixed(const TERM_FACTS& f, const NODE* t) const {
+        if (pointersAreFixed && t->type->is_pointer()) return true;
+        return f.fixed_in && f.fixed_in->level <= fixed->level;
+    }
+    bool is_common(const struct LOOP* l) const { return l->level <= common->level && loop_of_level(common, l->level) == l; }
+    static UNKNOWN unknown(WIDE by, const TERM_FACTS& f) {
+        if (f.counts) return {by, 0, last_iteration(f.counts)};
+        return f.is_bounded ? UNKNOWN{by, f.range.min, f.range.max} : UNKNOWN{by, -FAR, FAR};
+    }
+    void enter(const REFERENCE& x, const REFERENCE& y) {
+        std::vector<bool> is_matched(y.facts.size());
+        size_t i = 0;
+        for (const LINEAR_FORM::TERM& t : x.sum) {
+            const TERM_FACTS& f = x.facts[i++];
+            if (enter_count(f, t.coefficient, &LEVEL_TERM::a)) continue;
+            const LINEAR_FORM::TERM* other = f.counts ? nullptr : y.sum.find(t.tree);
+            const size_t j = other ? static_cast<size_t>(other - y.sum.begin()) : 0;
+            if (other && match(f, y.facts[j], t, other->coefficient))
+                is_matched[j] = true;
+            else
+                unknowns.push_back(unknown(t.coefficient, f));
+        }
+        i = 0;
+        for (const LINEAR_FORM::TERM& t : y.sum) {
+            const size_t j = i++;
+            if (!is_matched[j] && !enter_count(y.facts[j], t.coefficient, &LEVEL_TERM::b))
+                unknowns.push_back(unknown(-WIDE(t.coefficient), y.facts[j]));
+        }
+    }
+    bool enter_count(const TERM_FACTS& f, int64_t k, WIDE LEVEL_TERM::*side) {
+        if (!f.counts || !is_common(f.counts)) return false;
+        levels[static_cast<size_t>(f.counts->level)].*side += k;
+        return true;
+    }
+    bool match(const TERM_FACTS& f, const TERM_FACTS& g, const LINEAR_FORM::TERM& t, int64_t k_of_other) {
+        if (!is_fixed(f, t.tree) || !is_fixed(g, t.tree) || f.levels != g.levels) return false;
+        if (f.levels >> (common->level + 1)) return false; // of loops that are not around both
+        const UNKNOWN a = unknown(t.coefficient, f), b = unknown(-WIDE(k_of_other), g);
+        if (f.levels)
+            pairs.push_back({a, b, f.levels});
+        else if (a.by + b.by)
+            unknowns.push_back(joined(a, b));
+        return true;
+    }
+    static UNKNOWN joined(const UNKNOWN& a, const UNKNOWN& b) { // of one value
+        const WIDE low = std::max(a.low, b.low), high = std::min(a.high, b.high);
+        return low <= high ? UNKNOWN{a.by + b.by, low, high} : UNKNOWN{a.by + b.by, a.low, a.high};
+    }
+
+    // ---- Asking
+
+    // Whether the left side may be `e` while level `k` has the distances `d`, the others those that are left.
+    bool may_be(WIDE e, const DDEP& v, int k, DISTANCES d) const {
+        SPAN s;
+        s.add_constant(constant);
+        uint64_t in_step = 0; // levels at which the iterations are the same
+        for (int l = 1; l < v.count(); ++l) {
+            const DISTANCES at = l == k ? d : hull_of(v.dve[static_cast<size_t>(l)]);
+            if (at.is_zero()) in_step |= uint64_t(1) << l;
+            if (!levels[static_cast<size_t>(l)].add_to(&s, at)) return false;
+        }
+        for (const UNKNOWN& u : unknowns) s.add_multiple(u.by, u.low, u.high);
+        for (const PAIR& p : pairs) {
+            if (p.levels & ~in_step) {
+                s.add_multiple(p.a.by, p.a.low, p.a.high);
+                s.add_multiple(p.b.by, p.b.low, p.b.high);
+            } else {
+                const UNKNOWN u = joined(p.a, p.b);
+                s.add_multiple(u.by, u.low, u.high);
+            }
+        }
+        return s.may_be(e);
+    }
+
+    bool is_concerned(int level) const {
+        return levels[static_cast<size_t>(level)].is_there() ||
+               std::any_of(pairs.begin(), pairs.end(), [level](const PAIR& p) { return p.levels >> level & 1; });
+    }
+    // The level that alone is in the equation, with nothing unknown; 0 for none.
+    int only_level() const {
+        if (!unknowns.empty() || !pairs.empty()) return 0;
+        int found = 0;
+        for (size_t l = 1; l < levels.size(); ++l)
+            if (levels[l].is_there()) {
+                if (found) return 0;
+                found = static_cast<int>(l);
+            }
+        return found;
+    }
+
+    // a*x - a*(x + d) + constant = e. `may_be` has seen that it is divisible.
+    DDEP_PTR with_one_distance(DDEP_PTR v, int level, WIDE e) const {
+        const LEVEL_TERM& t = levels[static_cast<size_t>(level)];
+        if ((constant - e) % t.a) return nullptr;
+        const WIDE d = (constant - e) / t.a;
+        if (t.last < FAR && (d > t.last || d < -t.last)) return nullptr;
+        DVE& at = v->dve[static_cast<size_t>(level)];
+        at.keep_sole_distance(to_int65(d));
+        return at.is_dependent() ? std::move(v) : nullptr;
+    }
+
+    bool narrow_level(DDEP* v, int k, WIDE e, bool* any) const {
+        DVE& at = v->dve[static_cast<size_t>(k)];
+        const DVE before = at;
+        auto goes = [&](WIDE low, WIDE high) { return !may_be(e, *v, k, {low, high}); };
+        for (int d = -DVE::LIMIT; d <= DVE::LIMIT; ++d)
+            if (at.has_distance(INT65(d)) && goes(d, d)) at.clr_distance(INT65(d));
+        if (at.overflow_high && goes(DVE::LIMIT + 1, FAR)) at.overflow_high = false;
+        if (at.overflow_low && goes(-FAR, -DVE::LIMIT - 1)) at.overflow_low = false;
+        *any |= at != before;
+        return at.is_dependent();
+    }
+
+    struct LOOP *common, *fixed;
+    bool pointersAreFixed;
+    std::vector<LEVEL_TERM> levels;
+    std::vector<UNKNOWN> unknowns;
+    std::vector<PAIR> pairs;
+    WIDE constant = 0;
+};
+
+// The loop in which a value must be fixed to be the same for both references: outside of it the iterations are the same.
+struct LOOP* loop_of_differences(const DDEP& v, struct LOOP* common) {
+    int level = 1;
+    while (level < v.count() && v.dve[static_cast<size_t>(level)].has_only_SAME_dir()) ++level;
+    return loop_of_level(common, std::min(level, static_cast<int>(common->level)));
+}
+
+} // namespace
+
+DDEP_PTR narrow_by_addresses(DDEP_PTR v, const REFERENCE& a, EXTENT ea, const REFERENCE& b, EXTENT eb,
+                             struct LOOP* common, bool pointersAreFixed) {
+    EQUATION equation(a, b, common, loop_of_differences(*v, common), pointersAreFixed);
+    int64_t low = eb.low - ea.high + 1, high = eb.high - ea.low - 1;
+    if (high - low >= MOST_DIFFERENCES) {
+        equation.add_slack(low, high);
+        low = high = 0;
+    }
+    DDEP_PTR all;
+    for (int64_t e = low; e <= high; ++e) {
+        DDEP_PTR one = equation.narrowed(*v, e);
+        if (all)
+            all->set_union(one.get());
+        else
+            all = std::move(one);
+    }
+    return all;
+}

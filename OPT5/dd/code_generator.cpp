@@ -57,6 +57,7 @@ void denormalize_for_output(bool keep_ddnodes) {
 void find_records(struct LOOP* root) {
     wrap_memcpy_destinations();
     init_dependence_analysis();
+    if (print_debug >= 2) report_all_dependences();
     DDGRAPH graph;
     graph.build(root, !use_g2, use_g2 != 0);
     unmark_singleton_clones(root);

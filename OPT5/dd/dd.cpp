@@ -1,7 +1,5 @@
 // Not built yet: the passes leave the program as it is, and every question is answered with "not known".
 #include "OPT5/dd/dd.h"
-#include "OPT5/dd/dependence_vectors.h"
-#include "OPT5/dd/loop.h"
 #include "OPT5/dd/ssa.h"
 
 void report_ambiguous_aliases(struct LOOP*) {}
@@ -17,12 +15,3 @@ void interleave_reductions_in_loop(struct LOOP*, bool) {}
 void explode_local_arrays() {}
 void special_DMAC_conversion() {}
 void rotate_loops_for_accumulators() {}
-
-void compute_dependence_vectors(DDEP** fwd, DDEP** bwd, int order, const NODE* v1, struct LOOP* l1, const NODE* v2,
-                                struct LOOP* l2, bool, int spec) {
-    DDEP_PTR all = std::make_unique<DDEP>(innermost_common_loop(l1, l2)->level, true);
-    all->spec = spec;
-    const int sign = (order > 0) - (order < 0);
-    if (bwd) *bwd = make_feasible(std::make_unique<DDEP>(*all), -sign, v1 == v2).release();
-    *fwd = make_feasible(std::move(all), sign, v1 == v2).release();
-}

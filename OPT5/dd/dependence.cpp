@@ -263,28 +263,44 @@ namespace {
 
 struct LISTED {
     const NODE* lvalue;
-    const DDEPNODE* record;
+    const REFERENCE* record;
 };
+
+std::string text_of(const REFERENCE& r) {
+    std::string all = r.sum.is_exact ? "" : "wrapping ";
+    size_t i = 0;
+    for (const LINEAR_FORM::TERM& t : r.sum) {
+        const TERM_FACTS& f = r.facts[i++];
+        all += std::to_string(t.coefficient) + "*" + tree_to_infix(t.tree);
+        if (!f.counts) all += f.fixed_in ? "@" + std::to_string(f.fixed_in->level) : "@?";
+        all += " + ";
+    }
+    return all + std::to_string(r.sum.constant);
+}
 
 } // namespace
 
+// The value of a term behind `@` is fixed in the loop of that level.
 void report_all_dependences() {
     if (!loop_root() || !dependence_analysis_enabled) return;
     std::vector<LISTED> all;
     for_each_block_of(loop_root(), [&all](BBLK* bb) {
         for (const LIST* s = bb->statements; s; s = s->rest)
             for_each_node(s->first, [&all](NODE* t) {
-                if (const DDEPNODE* d = t->rare().dependence) all.push_back({d->root, d});
+                const DDEPNODE* d = t->rare().dependence;
+                if (d) all.push_back({d->root, static_cast<const REFERENCE*>(d)});
             });
     });
-    std::sort(all.begin(), all.end(), [](const LISTED& x, const LISTED& y) { return x.record->number < y.record->number; });
-    for (const LISTED& x : all)
-        for (const LISTED& y : all) {
-            if (y.record->number < x.record->number) continue;
-            const DDEP_PTR v =
-                compute_full_dependence_vector(x.lvalue, x.record->block->loop, y.lvalue, y.record->block->loop);
-            debug_printf("%d:%s ", x.record->number, tree_to_infix(x.lvalue).c_str());
-            debug_printf("%d:%s ", y.record->number, tree_to_infix(y.lvalue).c_str());
-            debug_printf("%s\n", v ? v->text().c_str() : "independent");
+    std::sort(all.begin(), all.end(),
+              [](const LISTED& x, const LISTED& y) { return x.record->number < y.record->number; });
+    for (const LISTED& x : all) {
+        debug_printf("%d: %s", x.record->number, tree_to_infix(x.lvalue).c_str());
+        debug_printf(" in loop%d, %s\n", x.record->block->loop->uid, text_of(*x.record).c_str());
+    }
+    for (size_t i = 0; i < all.size(); ++i)
+        for (size_t j = i; j < all.size(); ++j) {
+            const REFERENCE &x = *all[i].record, &y = *all[j].record;
+            const DDEP_PTR v = compute_full_dependence_vector(x.root, x.block->loop, y.root, y.block->loop);
+            if (v) debug_printf("%d %d %s\n", x.number, y.number, v->text().c_str());
         }
 }

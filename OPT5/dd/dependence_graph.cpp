@@ -7,7 +7,6 @@
 // exceptions, objects that the linker or the frame lays over others, are taken for unknown ones here.
 #include "OPT5/dd/dependence_graph.h"
 
-#include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/dependence.h"
 #include "OPT5/dd/loop.h"
@@ -303,12 +302,9 @@ void DDGRAPH::build(struct LOOP* loop, bool all_vectors, int spec) {
 void DDGRAPH::add_dependencies(NODE* v1, struct LOOP* l1, NODE* v2, struct LOOP* l2, int order) {
     const bool is_same = v1 == v2;
     if (is_same && l1->is_root() && !l1->irreducible) return;
-    if (!lvalues_may_be_aliased(v1, v2, innermost_common_loop(l1, l2))) return;
     const auto compute = [&](int spec, DDEP_PTR* forward, DDEP_PTR* backward) {
-        DDEP *f = nullptr, *b = nullptr;
-        compute_dependence_vectors(&f, &b, order, v1, l1, v2, l2, false, spec);
-        forward->reset(f);
-        backward->reset(is_same ? (delete b, nullptr) : b);
+        compute_dependence_vectors(forward, backward, order, v1, l1, v2, l2, false, spec);
+        if (is_same) backward->reset();
     };
     DDEP_PTR forward, backward, fast_forward, fast_backward;
     compute(spec_m, &forward, &backward);

@@ -127,6 +127,14 @@ public:
         for (; loop && sym_is_RC_in_loop(sym, loop); loop = loop->parent) outermost = loop;
         return outermost;
     }
+    // What the variable holds ahead of the loop, or null; owned here.
+    const NODE* value_ahead(const SYMTAB* sym, struct LOOP* loop) {
+        const auto [it, is_new] = ahead.try_emplace({sym, loop}, nullptr);
+        constexpr int BUDGET = 1000, DEPTH = 10;
+        if (is_new && loop->preheader)
+            it->second = find_symbol_value(const_cast<SYMTAB*>(sym), loop->preheader, loop, BUDGET, DEPTH);
+        return it->second;
+    }
     struct LOOP* keeps_memory(const NODE* read, struct LOOP* loop) {
         struct LOOP* outermost = nullptr;
         for (; loop && !changes(loop, read); loop = loop->parent) outermost = loop;
@@ -155,13 +163,64 @@ private:
 
     std::unordered_map<const SYMTAB*, struct LOOP*> counted;     // looked up alone
     std::unordered_map<const struct LOOP*, std::vector<ANSWER>> asked; // looked up alone
+    std::map<std::pair<const SYMTAB*, const struct LOOP*>, NODE*> ahead; // looked up alone
 
 public:
     ~KEPT_VALUES() {
         for (auto& [loop, answers] : asked)
             for (ANSWER& a : answers) erase_tree(a.read);
+        for (auto& [key, value] : ahead) erase_tree(value);
     }
 };
+
+// ---- Variables that a loop and the loop around it move
+
+// By how much one iteration of the loop around moves the variable, and how much of it comes ahead of the loop within.
+struct NEST_STEP {
+    bool is_known = false;
+    WIDE total = 0, before = 0;
+};
+
+// What all iterations of the loop add, if that is a constant.
+std::optional<WIDE> moved_by_loop(const SYMTAB* sym, struct LOOP* loop) {
+    const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, false);
+    const bool is_counted = loop->trips && loop->trips->op == ICON && loop->is_bottom_tested() && !loop->has(LOOP_early_exit);
+    if (!iv || !is_counted || !iv->has(IV_affine) || !iv->incrtree || iv->incrtree->op != ICON) return std::nullopt;
+    return to_wide(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type)) * to_wide(loop->trips->u.lval);
+}
+
+std::optional<WIDE> amount_of(const INDUCTION_UPDATE& u);
+
+// Each iteration of the loop around `inner` must execute every update: those of `inner`, and those of its own head and
+// tail.
+NEST_STEP step_over_nest(const SYMTAB* sym, struct LOOP* inner) {
+    struct LOOP* around = inner->parent;
+    const bool is_exact = sym->type->is_pointer() || (sym->type->is_int() && sym->type->is_signed());
+    const auto by_inner = moved_by_loop(sym, inner);
+    if (!is_exact || !by_inner || !around->VLCV || !only_its_name_reaches(sym) || !around->tail ||
+        !bb_dominates_bb(inner->head, around->tail))
+        return {};
+    NEST_STEP step{true, *by_inner, 0};
+    for (BBLK* bb : around->contents) {
+        if (bb->loop == inner) continue;
+        if (bb->loop != around) {
+            if (!sym_is_RC_in_loop(sym, bb->loop)) return {};
+            continue;
+        }
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            bool is_written = false;
+            for_each_written_name(s->first, [&](const NODE* name, const NODE*) { is_written |= name->u.sym == sym; });
+            if (!is_written) continue;
+            INDUCTION_UPDATE u;
+            const bool is_update = is_induction_update(s->first, &u) && u.sym == sym && !u.is_narrowed;
+            const auto amount = is_update ? amount_of(u) : std::nullopt;
+            if (!amount || (bb != around->head && bb != around->tail)) return {};
+            step.total += *amount;
+            if (bb == around->head) step.before += *amount;
+        }
+    }
+    return step;
+}
 
 // ---- The sum
 
@@ -175,8 +234,8 @@ public:
         LINEAR_FORM& sum = made.sum;
         if (!read(umult->left, 1) || (umult->right && !read(umult->right, 1))) {
             sum = LINEAR_FORM(ADDRESS_BITS);
-            sum.add(umult->left, 1);
-            if (umult->right) sum.add(umult->right, 1);
+            sum.add(own(copy_tree(umult->left)), 1);
+            if (umult->right) sum.add(own(copy_tree(umult->right)), 1);
         }
         for (const LINEAR_FORM::TERM& t : sum) made.facts.push_back(facts_of(t.tree));
     }
@@ -225,7 +284,7 @@ private:
         if (nodes_left < 0 || depth > MOST_DEPTH) return false;
         if (t->op == UAND && t->type->is_pointer() && k == 1) return read_place(t->left);
         if (t->op == NAME && is_readable_variable(t)) return variable(t, k);
-        if (t->op == MIXVALUE || !is_opened_inside(t)) return form.add(t, k);
+        if (!is_opened_inside(t)) return form.add(own(copy_tree(t)), k);
         return form.add(own(with_values(copy_tree(t))), k);
     }
     // The address of the place: of an object, or the pointer and what is added.
@@ -249,14 +308,14 @@ private:
 
     bool variable(const NODE* t, int64_t k) {
         const SYMTAB* sym = t->u.sym;
-        if (entered && !sym_is_RC_in_loop(sym, entered)) return form.add(own(entry_value(sym, entered)), k);
+        if (entered && !sym_is_RC_in_loop(sym, entered)) return value_on_entry(sym, entered, k);
         if (const NODE* value = entered ? nullptr : point.value_of(sym))
             if (same_numbers(value->type, t->type) && is_readable(value)) return at_depth([&] { return read(value, k); });
         if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, true))
             if (is_affine(iv)) return induction(iv, k);
         if (const LOOPIV* rc = record_of_invariant(sym))
             return at_entry(rc->loop, [&] { return read(rc->init, k); });
-        return form.add(t, k);
+        return form.add(own(copy_tree(t)), k);
     }
     const LOOPIV* record_of_invariant(const SYMTAB* sym) const {
         for (struct LOOP* l = loop; l && sym_is_RC_in_loop(sym, l); l = l->parent)
@@ -297,7 +356,20 @@ private:
             }
             return at_entry(iv->loop, [&] { return read(init, k); });
         }
-        return form.add(own(entry_value(iv->sym, iv->loop)), k);
+        return value_on_entry(iv->sym, iv->loop, k);
+    }
+    // What the loop is entered with and no record says: where the loop around moves the variable by the same amount in
+    // each iteration, a sum again.
+    bool value_on_entry(const SYMTAB* sym, struct LOOP* of, int64_t k) {
+        struct LOOP* around = of->parent;
+        const NEST_STEP step = around && !around->is_root() ? step_over_nest(sym, of) : NEST_STEP();
+        if (!step.is_known || depth > MOST_DEPTH) return form.add(own(entry_value(sym, of)), k);
+        form.add_constant(form.reduced(WIDE(k) * step.before));
+        if (!form.add(own(mk_NAME(around->VLCV->sym)), form.reduced(WIDE(k) * step.total))) return false;
+        const NODE* init = kept.value_ahead(sym, around);
+        if (init && same_numbers(init->type, sym->type) && is_readable(init))
+            return at_entry(around, [&] { return read(init, k); });
+        return at_depth([&] { return value_on_entry(sym, around, k); });
     }
     static const NODE* readable_init(const LOOPIV* iv) {
         const NODE* init = iv->init;

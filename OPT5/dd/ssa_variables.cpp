@@ -98,6 +98,7 @@ SSAVAR* make_entry(const SSA_PLACE& place, const NODE* lvalue, SSAVAR*& first) {
     v->start = place.start;
     v->length = place.length;
     v->tree = copy_tree_removing_SSA_operators(lvalue);
+    set_SSAVAR_flags(v);
     if (first) {
         v->ring = first->ring;
         first->ring = v;

@@ -50,6 +50,8 @@ bool L2_with_branches_on_28() { return L2_with_branches() && cpu_version == 28; 
 bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
 // What such a row does is for loops alone: a function without needs not be brought into the form of its frame.
 bool L2_with_loops() { return L2() && has_loops(); }
+bool L2_with_loops_for_speed() { return L2_with_loops() && size_speed_goal() >= 4; }
+bool L2_with_assertions() { return L2() && currfuninfo->has_nasserts; }
 bool is_stack_shared() { return L1() || !has_hardware_float(); }
 bool fusion_is_enabled() { return L2() && pass_enable_loop_fusion; }
 
@@ -224,19 +226,19 @@ const ROW steps[] = {
     /* 17 */ {L, "intraprocedural MVP", nullptr, L2, intraprocedural_MVP, none, none},
     /* 18 */ {L, "value propagation for SIMD", nullptr, L2_and_SIMD, value_propagation_for_SIMD, none, none},
     /* 19 */ {F, "explode auto structs", nullptr, L2, explode_auto_struct_vars, none, graph},
-    /* 20 */ {L, "non-DD clone SSA NASSERTs", nullptr, L2, [] { in_SSA_form<true>(clone_SSA_NASSERTs); }, none, none},
-    /* 21 */ {L, "non-DD SSA CP", nullptr, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(1); }); }, none, none},
-    /* 22 */ {L, "non-DD SSA EDA", nullptr, L2, [] { in_SSA_form<true>(eliminate_dead_SSA_assignments); }, none, none},
+    /* 20 */ {F, "non-DD clone SSA NASSERTs", nullptr, L2_with_assertions, [] { in_SSA_form<true>(clone_SSA_NASSERTs); }, none, graph | alias_marks},
+    /* 21 */ {F, "non-DD SSA CP", nullptr, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(1); }); }, none, graph | alias_marks},
+    /* 22 */ {F, "non-DD SSA EDA", nullptr, L2, [] { in_SSA_form<true>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
     /* 23 */ {L, "SSA RP with benign loads", nullptr, L2, [] { promote_vars_to_registers(true); }, none, none},
     /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
     /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
     /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
     /* 28 */ {F, "forward_substitution", &DF, L2_with_loops, nothing, none, graph | alias_marks},
-    /* 29 */ {L, "SSA_hoist", &D, L2, [] { in_SSA_form<true>(hoist_SSA_region_constants); }, none, none},
-    /* 30 */ {L, "SSA_NASSERTs", &N, L2, [] { in_SSA_form<false>(clone_SSA_NASSERTs); }, none, none},
-    /* 31 */ {L, "SSA_propagate", &D, L2, [] { in_SSA_form<false>([] { propagate_SSA_constants(3); }); }, none, none},
-    /* 32 */ {L, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, none},
+    /* 29 */ {F, "SSA_hoist", &D, L2_with_loops_for_speed, [] { in_SSA_form<true>(hoist_SSA_region_constants); }, none, graph | alias_marks},
+    /* 30 */ {F, "SSA_NASSERTs", &N, L2_with_assertions, [] { in_SSA_form<false>(clone_SSA_NASSERTs); }, none, graph | alias_marks},
+    /* 31 */ {F, "SSA_propagate", &D, L2, [] { in_SSA_form<false>([] { propagate_SSA_constants(3); }); }, none, graph | alias_marks},
+    /* 32 */ {F, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
     /* 33 */ {L, "SSA_reg_promote", &N, L2, [] { promote_vars_to_registers(false); }, none, none},
     /* 34 */ {F, "loop_assertions", &D, L2_with_loops, [] { with_hierarchy([] { find_loop_assertions(nullptr); }); }, none, graph | alias_marks},
     /* 35 */ {F, "sink_unused_definitions", &D, L2_with_loops, [] { with_hierarchy(sink_definitions); }, none, graph | alias_marks},
@@ -262,8 +264,8 @@ const ROW steps[] = {
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {L, "value_propagation", &D, L2, value_propagation, none, none},
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},
-    /* 58 */ {L, "SSA_propagate_vector", &D, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(3); }); }, none, none},
-    /* 59 */ {L, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, none},
+    /* 58 */ {F, "SSA_propagate_vector", &D, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(3); }); }, none, graph | alias_marks},
+    /* 59 */ {F, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
     /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_vars_to_registers(false); }, none, graph},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
     /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},

@@ -98,6 +98,7 @@ NODE* peel_for_effect(NODE* t) {
     case OROR: return peel_logical(t);
     case QUEST: return peel_conditional(t);
     case UAND: return peel_address(t);
+    case SSA_MU: return tree_has_side_effects(t->left) ? t : peel_operands(t);
     case ICALL:
         if (contains_output_argument(t->left)) return t;
         return peel_operands(t);

@@ -130,18 +130,13 @@ bool ssa_value_is_likely_register(const NODE* tree); // an SSA_USE of one, or a 
 bool scalar_analysis_IV_candidate(const NODE* lvalue);
 bool tree_is_level_1_parameter(const NODE* tree);
 
-// Every definition that is no phi and every use of a tree, operands ahead of what holds them and the right operand of
-// an assignment ahead of its left: the order of renaming.
+// Every definition that is no phi and every use of a tree, operands ahead of what holds them and the right operand
+// ahead of the left: the order of renaming.
 template <class F>
 void for_each_SSA_operator(NODE* t, F&& visit) {
     if (!t) return;
-    if (opcode_is_ASG(t->op)) {
-        for_each_SSA_operator(t->right, visit);
-        for_each_SSA_operator(t->left, visit);
-    } else {
-        for_each_SSA_operator(t->left, visit);
-        for_each_SSA_operator(t->right, visit);
-    }
+    for_each_SSA_operator(t->right, visit);
+    for_each_SSA_operator(t->left, visit);
     if (op_is_SSA(t->op)) visit(t);
 }
 

@@ -231,7 +231,7 @@ private:
                 v.used_in = bb;
             }
             count_uses(t->right, is_in_mark, bb);
-            stays = is_in_mark || left_is_place(t);
+            stays = is_in_mark || left_is_place(t) || (stays && is_around_use(t));
         }
     }
 
@@ -315,6 +315,8 @@ private:
         return writes_left_operand(t->op) || t->op == UAND || t->op == ARGREF || t->op == STDOT;
     }
 
+    static bool is_around_use(const NODE* t) { return t->op == SSA_MU || t->op == SSA_CHI; }
+
     NODE* replace(NODE* t, bool is_place) {
         if (!t) return t;
         if (t->op == SSA_USE && !is_place)
@@ -328,7 +330,7 @@ private:
                 return effects ? mk_COMMAOP(effects, value) : value;
             }
         if (reads_place(t)) t = with_known_operand(t);
-        t->left = replace(t->left, left_is_place(t));
+        t->left = replace(t->left, left_is_place(t) || (is_place && is_around_use(t)));
         t->right = replace(t->right, false);
         // In normal form the constant terms of a pointer are in the subscript.
         if (trees_are_normalized && t->op == UMULT && (t->left->op == PLUS || t->left->op == PCONV))
@@ -357,7 +359,12 @@ private:
     // `x op= e` becomes `x = x op e` if the x that is read is known; the place stays what it is.
     NODE* with_known_operand(NODE* t) {
         NODE* use = t->left;
+        while (use->op == SSA_MU) use = use->left; // of what overlaps the place
         if (use->op != SSA_USE || !ssa_reach(use) || !value_of(ssa_reach(use)).tree) return t;
+        for (NODE* mu = t->left; mu != use; mu = t->left) {
+            t->left = mu->left;
+            erase_node(mu);
+        }
         const int op = t->op;
         if (op == PLUSPLUS || op == MINMIN) t->op = op == PLUSPLUS ? PLUSASG : MINUSASG;
         t = opASG_to_ASG(t);

@@ -122,7 +122,7 @@ private:
     }
 
     static bool is_constant(const NODE* t) {
-        return expr_is_propagable(t, 1) && t->op != SCON && !t->type->is_volatile();
+        return expr_is_propagable(t, 2) && !t->type->is_volatile(); // a string is one object
     }
 
     NODE* constant_of_phi(const NODE* phi) {

@@ -160,7 +160,8 @@ void covered_in_part(struct outer* p, struct outer* o, int* q, int i, int x) {
 // FUNCTION: place_moves
 // COUNT 2: * 17
 // COUNT 2: * 18
-// COUNT 2: /^\*r =/
+// COUNT 1: /^\*r =/
+// HAS: _shared.a = x
 void place_moves(struct pair* p, int** q, int** r, int x) {
     p->a = x * 17;
     ++p;

@@ -29,12 +29,12 @@ int passed(int x) {
 // FUNCTION: kept
 // HAS: t =struct _make(x)
 // HAS: v =struct t
-// HAS: u =struct _make(4)
+// HAS: u =struct _make(x)
 // HAS: w =struct u
 // HAS: s =struct _make(w.c)
 // HAS: w =struct s
 int kept(int x) {
-    struct six t, v, u, w = {1, 2, 3, 4, 5, 6}, s;
+    struct six t, v, u, w = {1, 2, 3, x, 5, 6}, s;
     seen = &v;
     v.a = 50;
     t = make(x);

@@ -12,6 +12,12 @@ struct PLACE {
     BASE base = B_ABS;
     int64_t at = 0;
     uint64_t units = 0;
+    bool is_register = false; // a local scalar whose address nothing takes: a compiler keeps it in a register
+};
+
+// The accesses of one node; `fields` of them to bit-fields.
+struct ACCESSES {
+    unsigned loads = 0, stores = 0, fields = 0, memory_loads = 0, memory_stores = 0;
 };
 
 struct LVALUE {
@@ -20,6 +26,7 @@ struct LVALUE {
     int64_t k = 0;
     int64_t low = 0, high = 0; // of B_ABS and B_FRAME: the object that k must stay in
     bool is_field = false;
+    bool is_register = false;
     unsigned bit = 0, width = 0; // of a field
     SHAPE shape;                 // of what is there; of a field's declared type
 };
@@ -38,6 +45,12 @@ struct CALL_SITE {
     std::string name;
 };
 
+// What a node adds to the statistics.
+struct COUNTED {
+    std::vector<uint16_t> ops;
+    ACCESSES accesses;
+};
+
 struct PROGRAM {
     const IC_UNIT& unit;
     EXEC_OPTIONS options;
@@ -46,7 +59,7 @@ struct PROGRAM {
     std::deque<XNODE> nodes;
     std::deque<SWITCH_TABLE> tables;
     std::deque<std::string> texts;
-    std::deque<std::vector<uint16_t>> counted;
+    std::deque<COUNTED> counted;
     std::vector<std::shared_ptr<void>> records;
     std::unordered_map<const IC_SYMBOL*, PLACE> places;    // objects of the unit
     std::unordered_map<const IC_SYMBOL*, int64_t> entries; // functions: addresses
@@ -101,7 +114,7 @@ private:
     std::unordered_map<const IC_SYMBOL*, PLACE> locals;
     std::unordered_map<uint32_t, int64_t> registers; // VREG number to its offset in the frame
     std::vector<uint16_t>* folded = nullptr;         // operators that became part of the node in work
-    unsigned loads = 0, stores = 0, fields = 0;      // accesses of that node; `fields` of them to bit-fields
+    ACCESSES accesses;                               // of that node
     uint32_t cost = 0;
     size_t depth = 0, deepest = 0;
     std::vector<std::pair<uint32_t, const IC_NODE*>> jumps; // statement, label
@@ -140,6 +153,8 @@ private:
     const XNODE* address(const LVALUE& lv);
     XNODE* access(EVAL (*pick)(REP, BASE), const LVALUE& lv, const XNODE* b);
     XNODE* field_access(EVAL (*pick)(BASE), const LVALUE& lv, const XNODE* b);
+    void count_load(const LVALUE& lv);
+    void count_store(const LVALUE& lv);
     void settle(LVALUE& lv); // an address outside its object is checked when it is used
     const XNODE* load(const LVALUE& lv);
     const XNODE* assign(const IC_NODE* n);

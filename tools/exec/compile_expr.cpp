@@ -37,10 +37,13 @@ int64_t check_holds(const XNODE* x, MACHINE& m) {
 }
 int64_t count(const XNODE* x, MACHINE& m) {
     NODE_COUNTS& c = m.counts;
-    for (uint16_t opcode : *static_cast<const std::vector<uint16_t>*>(x->extra)) c.by_op[opcode]++;
-    c.loads += x->m;
-    c.stores += x->n;
-    c.fields += static_cast<uint64_t>(x->k);
+    const COUNTED& counted = *static_cast<const COUNTED*>(x->extra);
+    for (uint16_t opcode : counted.ops) c.by_op[opcode]++;
+    c.loads += counted.accesses.loads;
+    c.stores += counted.accesses.stores;
+    c.memory_loads += counted.accesses.memory_loads;
+    c.memory_stores += counted.accesses.memory_stores;
+    c.fields += counted.accesses.fields;
     return run(x->a, m);
 }
 
@@ -87,26 +90,21 @@ const XNODE* COMPILER::value(const IC_NODE* n) {
     if (++depth > deepest) deepest = depth;
     std::vector<uint16_t> ops{static_cast<uint16_t>(n->op)};
     std::vector<uint16_t>* outer = folded;
-    const unsigned outer_loads = loads, outer_stores = stores, outer_fields = fields;
+    const ACCESSES outer_accesses = accesses;
     folded = &ops;
-    loads = stores = fields = 0;
+    accesses = {};
     const XNODE* x = build(n);
     if (p.options.stats) x = counting(x, ops);
     folded = outer;
-    loads = outer_loads;
-    stores = outer_stores;
-    fields = outer_fields;
+    accesses = outer_accesses;
     depth--;
     return x;
 }
 
 const XNODE* COMPILER::counting(const XNODE* x, const std::vector<uint16_t>& ops) {
-    p.counted.push_back(ops);
+    p.counted.push_back({ops, accesses});
     XNODE* counter = p.node(count, x);
     counter->extra = &p.counted.back();
-    counter->m = loads;
-    counter->n = stores;
-    counter->k = fields;
     return counter;
 }
 

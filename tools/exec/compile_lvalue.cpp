@@ -37,6 +37,16 @@ int64_t COMPILER::slot(uint64_t units) {
     return -static_cast<int64_t>(f->frame);
 }
 
+void COMPILER::count_load(const LVALUE& lv) {
+    accesses.loads++;
+    accesses.memory_loads += !lv.is_register;
+}
+
+void COMPILER::count_store(const LVALUE& lv) {
+    accesses.stores++;
+    accesses.memory_stores += !lv.is_register;
+}
+
 LVALUE COMPILER::through(const XNODE* address, const SHAPE& shape) {
     LVALUE lv;
     lv.address = address;
@@ -59,6 +69,7 @@ LVALUE COMPILER::name_lvalue(const IC_NODE* n) {
     lv.base = place.base;
     lv.k = lv.low = place.at;
     lv.high = place.at + static_cast<int64_t>(place.units);
+    lv.is_register = place.is_register;
     lv.shape = shape_of(s->type);
     const SHAPE as = shape_of(n->type);
     if (lv.shape.rep == R_AGG || lv.shape.rep == R_VOID) lv.shape = as;
@@ -202,7 +213,7 @@ XNODE* COMPILER::access(EVAL (*pick)(REP, BASE), const LVALUE& lv, const XNODE* 
 }
 
 XNODE* COMPILER::field_access(EVAL (*pick)(BASE), const LVALUE& lv, const XNODE* b) {
-    fields++;
+    accesses.fields++;
     XNODE* x = p.node(pick(lv.base), lv.address, b, lv.k);
     x->m = lv.bit;
     x->n = lv.width;
@@ -214,7 +225,7 @@ const XNODE* COMPILER::load(const LVALUE& from) {
     LVALUE lv = from;
     if (!lv.is_field && !lv.shape.is_int() && !lv.shape.is_float()) return address(lv);
     settle(lv);
-    loads++;
+    count_load(lv);
     if (lv.is_field) return field_access(bits_load_eval, lv, nullptr);
     const XNODE* x = access(load_eval, lv, nullptr);
     if (lv.shape.is_int() && lv.shape.bits < lv.shape.units * 16) {
@@ -226,8 +237,8 @@ const XNODE* COMPILER::load(const LVALUE& from) {
 }
 
 const XNODE* COMPILER::copy(const LVALUE& to, const XNODE* from) {
-    stores++;
     LVALUE lv = to;
+    count_store(lv);
     settle(lv);
     XNODE* x = p.node(copy_eval(lv.base), lv.address, from, lv.k);
     x->n = lv.shape.units;
@@ -246,7 +257,7 @@ const XNODE* COMPILER::assign(const IC_NODE* n) {
     if (lv.shape.rep == R_AGG && !lv.is_field) return copy(lv, v);
     if (!lv.shape.is_int() && !lv.shape.is_float()) return unsupported(n);
     settle(lv);
-    stores++;
+    count_store(lv);
     v = convert(v, from, lv.shape);
     const XNODE* x = lv.is_field ? field_access(bits_store_eval, lv, v) : access(store_eval, lv, v);
     return convert(x, lv.shape, s);
@@ -259,8 +270,8 @@ const XNODE* COMPILER::compound(const IC_NODE* n, int opcode, bool before) {
     const XNODE* by = right ? value(right) : constant(1);
     LVALUE lv = lvalue(n->left);
     settle(lv);
-    loads++;
-    stores++;
+    count_load(lv);
+    count_store(lv);
     const SHAPE& at = lv.shape;
     if (!at.is_int() && !at.is_float()) return unsupported(n);
     const bool adds = opcode == op::PLUS || opcode == op::MINUS;
@@ -281,8 +292,9 @@ const XNODE* COMPILER::compound(const IC_NODE* n, int opcode, bool before) {
     there.base = B_EXPR;
     there.k = 0;
     there.address = p.node(give_place);
-    loads--;
+    const ACCESSES counted = accesses;
     c->read = load(there);
+    accesses = counted; // of the place that was counted
     c->combine = arithmetic(opcode, p.node(give_old), at, p.node(give_right), sb, at);
     const XNODE* result = p.node(give_right);
     c->write = lv.is_field ? field_access(bits_store_eval, there, result) : access(store_eval, there, result);

@@ -196,8 +196,8 @@ const XNODE* COMPILER::lane_operation(int opcode, bool complex, const SHAPE& a, 
 // The object is read, combined and written in one place; the address is computed once.
 const XNODE* COMPILER::update_lanes(const IC_NODE* n, int opcode) {
     const LVALUE lv = lvalue(n->left);
-    loads++;
-    stores++;
+    count_load(lv);
+    count_store(lv);
     UPDATE* u = p.make<UPDATE>();
     u->address = address(lv);
     u->value = lanes(n, opcode, p.node(updated_place));

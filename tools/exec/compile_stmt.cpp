@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <unordered_set>
 
 namespace {
 enum : int { class_global = 2, class_static = 3, class_extern = 5 };
@@ -14,6 +15,15 @@ bool is_comment(const char* text) {
     while (*text == ' ' || *text == '\t') text++;
     return *text == 0 || *text == ';' || *text == '*' || *text == '\n';
 }
+// The symbols whose address a tree takes.
+void collect_addressed(const IC_NODE* n, std::unordered_set<const IC_SYMBOL*>& addressed) {
+    for (; n; n = n->left) {
+        const IC_NODE* place = n->op == op::UAND ? strip_marks(n->left) : nullptr;
+        if (place && place->op == op::NAME) addressed.insert(place->sym);
+        collect_addressed(n->right, addressed);
+    }
+}
+
 int64_t count_down(const XNODE* x, MACHINE& m) { return run(x->a, m) == 0; }
 } // namespace
 
@@ -22,6 +32,9 @@ int64_t count_down(const XNODE* x, MACHINE& m) { return run(x->a, m) == 0; }
 // the frame pointer, and the arguments that have no name lie behind it.
 void COMPILER::lay_out_frame() {
     size_t parameter = 0;
+    std::unordered_set<const IC_SYMBOL*> addressed;
+    for (size_t i = f->source->first; i <= f->source->last && i < p.unit.items.size(); i++)
+        if (p.unit.items[i].kind == IFR_EXPR) collect_addressed(p.unit.items[i].tree, addressed);
     for (IC_SYMBOL* s : f->source->locals) {
         if (s->sclass == class_static || s->sclass == class_extern || p.entries.count(s)) continue;
         const SHAPE shape = shape_of(s->type);
@@ -29,12 +42,14 @@ void COMPILER::lay_out_frame() {
         const uint64_t mask = units > 1 ? std::max<uint64_t>(shape.align_mask, 1) : shape.align_mask;
         const bool is_parameter = s->level == 1 && parameter < f->params.size();
         if (f->variadic && is_parameter && parameter + 1 == f->params.size()) {
-            locals[s] = {B_FRAME, 0, units};
+            locals[s] = {B_FRAME, 0, units, false};
             f->params[parameter++].offset = 0;
             continue;
         }
         f->frame = (f->frame + units + mask) & ~mask;
-        locals[s] = {B_FRAME, -static_cast<int64_t>(f->frame), units};
+        const bool is_scalar = shape.is_int() || shape.is_float();
+        locals[s] = {B_FRAME, -static_cast<int64_t>(f->frame), units,
+                     is_scalar && !addressed.count(s) && !s->type->is_volatile()};
         if (is_parameter) f->params[parameter++].offset = locals[s].at;
     }
 }

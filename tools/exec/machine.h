@@ -160,6 +160,7 @@ struct EXEC_THROW {
 struct NODE_COUNTS {
     uint64_t by_op[164] = {};
     uint64_t loads = 0, stores = 0, calls = 0, multiplies = 0;
+    uint64_t memory_loads = 0, memory_stores = 0; // those of other than scalars that a register can hold
     uint64_t branches = 0, tests = 0; // `tests` of them have a condition
     uint64_t fields = 0;              // loads and stores of bit-fields
 };

@@ -76,9 +76,9 @@ void print_stats(const PROGRAM& p, FILE* out) {
     const uint64_t multiplies = c.by_op[op::MULT] + c.by_op[op::MULTASG] + c.by_op[op::SQR] + c.multiplies;
     std::fprintf(out,
                  "nodes %llu loads %llu stores %llu calls %llu branches %llu multiplies %llu statements %llu "
-                 "operations %llu\n",
+                 "operations %llu memory_loads %llu memory_stores %llu\n",
                  ull(nodes), ull(c.loads), ull(c.stores), ull(c.calls), ull(c.branches), ull(multiplies),
-                 ull(statements), ull(operations(c)));
+                 ull(statements), ull(operations(c)), ull(c.memory_loads), ull(c.memory_stores));
     print_loops(p, out);
     for (int i = 0; i < 164; i++)
         if (c.by_op[i]) std::fprintf(out, "%12llu %s\n", ull(c.by_op[i]), if_node_info[i].name);

@@ -1,4 +1,603 @@
-// Promotion of values in memory to registers: not built yet.
-#include "OPT5/dd/ssa.h"
+// Promotion of memory to registers: a scalar in memory that was read or written before is taken from a temporary.
+//
+// Each candidate has one temporary, which mirrors the place. A load whose value is known on every path becomes a read of
+// the temporary, and where it is known on some paths a load is inserted on the others (code_motion.h). Loads that a loop
+// does in each iteration are made ahead of it even where it may run no iteration, if the place is of fixed address: a
+// benign load. The second sweep looks at stores too (register_promotion_stores.cpp).
+//
+// Needs: statements without assignments inside them where possible. Leaves: nothing of what rests on the graph.
+// Sound because the temporary holds what the place holds wherever it is read: it is set at each load that is kept, at each
+// store, and on edges, and from there to the read no chi, no write of the pointer and no statement that an exception may
+// leave in its middle lies on any path. A load is inserted only where one follows on each path before the place may
+// change, and, behind a pointer, before a call that may not return: `if (p) s += *p` reads nothing ahead of the test.
+#include "OPT5/dd/register_promotion.h"
 
-void promote_vars_to_registers(bool) {}
+#include "OPT5/alias/effects.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/frequencies.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/scalar/lcse.h"
+#include "OPT5/scalar/lowering.h"
+
+#include <algorithm>
+#include <cstring>
+#include <unordered_map>
+
+PROMOTION_CANDIDATE::~PROMOTION_CANDIDATE() { erase_tree(reference); }
+
+SYMTAB* PROMOTION_TEMPS::of(const PROMOTION_CANDIDATE& c) {
+    const SSAVAR* v = c.variable;
+    for (const ENTRY& e : entries)
+        if (e.base == v->base() && e.is_indirect == (v->pointer != nullptr) && e.start == v->start &&
+            e.length == v->length && equiv_mtypes(e.temp->type, c.reference->type))
+            return e.temp;
+    SYMTAB* temp = sym_temp('v', -1, c.reference->type->stqs(), nullptr);
+    entries.push_back({v->base(), v->pointer != nullptr, v->start, v->length, temp});
+    return temp;
+}
+
+static bool is_access(int op) { return op == NAME || op == UMULT || op == STDOT || op == STREF; }
+
+bool may_leave_in_the_middle(const NODE* statement) {
+    return any_subtree(statement, [](const NODE* t) {
+        return op_is_call(t->op) || t->op == MCALL || t->op == UMCALL || t->op == ASM ||
+               (is_access(t->op) && lvalue_is_volatile(t));
+    });
+}
+
+namespace {
+
+using EVENT = PROMOTION_EVENT;
+using CANDIDATE = PROMOTION_CANDIDATE;
+
+// ---- Candidates
+
+bool is_candidate(const SSAVAR* v) {
+    if (v->has(SSAVAR_munged | SSAVAR_likely_register)) return false;
+    const TYPE* type = v->tree->type;
+    if (!type->is_scalar() || type->is_complex() || type->is_vector() || type->is_bool()) return false;
+    const SYMTAB* base = v->base();
+    if (base->level == 1 || base->cqual & CQ_GLOBAL_REGISTER) return false;
+    if (v->pointer) return only_its_name_reaches(base) && good_CSE_tree(v->tree, false);
+    if (is_optimizer_temp(base->name, 'v', 'v')) return false;
+    return name_accessed(v->tree) || good_CSE_tree(v->tree, false);
+}
+
+// ---- What happens to them
+
+class COLLECTOR {
+public:
+    COLLECTOR(const std::vector<std::unique_ptr<CANDIDATE>>& all, const MOTION_GRAPH& graph, bool with_assertions)
+        : first_stop(graph.blocks.size(), INT32_MAX), with_assertions(with_assertions) {
+        for (const auto& c : all) {
+            by_uid.resize(std::max<size_t>(by_uid.size(), c->variable->uid + 1), nullptr);
+            by_uid[c->variable->uid] = c.get();
+            if (c->variable->pointer) behind[c->variable->pointer].push_back(c.get());
+        }
+        for (block = 1; block < graph.blocks.size(); ++block) collect(graph.blocks[block]);
+    }
+    std::vector<int> first_stop; // by block: the first statement that may not come to its end
+
+private:
+    CANDIDATE* of(const NODE* t) const {
+        const uint32_t uid = ssa_variable(t)->uid;
+        return uid < by_uid.size() ? by_uid[uid] : nullptr;
+    }
+    void collect(const BBLK* bb);
+    void walk(NODE** link, bool is_conditional);
+    void visit(NODE** link, bool is_conditional);
+    void definition(CANDIDATE* c, NODE* assignment);
+    void push(CANDIDATE* c, EVENT::KIND kind, NODE** link = nullptr, bool is_conditional = false) {
+        c->events.push_back({kind, block, order, cell, link, is_conditional});
+    }
+
+    std::vector<CANDIDATE*> by_uid;
+    std::unordered_map<const SYMTAB*, std::vector<CANDIDATE*>> behind; // looked up, never walked
+    const bool with_assertions;
+    size_t block = 0;
+    int order = 0;
+    LIST* cell = nullptr;
+    bool is_left_in_middle = false;
+};
+
+void COLLECTOR::collect(const BBLK* bb) {
+    order = 0;
+    for (cell = bb->statements; cell; cell = cell->rest, ++order) {
+        NODE* t = cell->first;
+        if (!t || t->op == SSA_PHI || tree_is_arg_prolog(t)) continue;
+        if ((t->op == NASSERT || t->op == ASSERT) && !with_assertions) continue;
+        is_left_in_middle = cell->rest && tree_is_EH_SWITCH(cell->rest->first);
+        walk(&cell->first, t->op == NASSERT || t->op == ASSERT);
+        if (first_stop[block] == INT32_MAX && may_leave_in_the_middle(t)) first_stop[block] = order;
+        if (behind.empty()) continue;
+        for_each_written_name(t, [this](const NODE* name, const NODE*) {
+            auto at = behind.find(name->u.sym);
+            if (at == behind.end()) return;
+            for (CANDIDATE* c : at->second) push(c, EVENT::KILL);
+        });
+    }
+}
+
+// In the order of evaluation.
+void COLLECTOR::walk(NODE** link, bool is_conditional) {
+    NODE* t = *link;
+    if (!t) return;
+    if (opcode_is_ASG(t->op)) {
+        walk(&t->right, is_conditional);
+        walk(&t->left, is_conditional);
+    } else {
+        walk(&t->left, is_conditional);
+        switch (t->op) {
+        case IF:
+        case SWITCH: break; // labels
+        case ANDAND:
+        case OROR:
+        case QUEST: walk(&t->right, true); break;
+        case COMMAOP:
+            if (t->right) walk(&t->right, is_conditional || may_leave_in_the_middle(t->left));
+            break;
+        default: walk(&t->right, is_conditional);
+        }
+    }
+    if (op_is_SSA(t->op)) visit(link, is_conditional);
+}
+
+void COLLECTOR::visit(NODE** link, bool is_conditional) {
+    NODE* t = *link;
+    CANDIDATE* c = of(t);
+    if (!c) return;
+    if (!c->reference && (t->op == SSA_USE || ssa_assignment(t)))
+        c->reference = copy_tree_removing_SSA_operators(t->op == SSA_USE ? t->left : ssa_assignment(t)->left);
+    if (t->op == SSA_USE)
+        push(c, EVENT::USE, link, is_conditional);
+    else if (t->op == SSA_CHI)
+        push(c, EVENT::KILL);
+    else if (t->op == SSA_DEF)
+        definition(c, ssa_assignment(t));
+}
+
+// A compound assignment reads its place last of all.
+void COLLECTOR::definition(CANDIDATE* c, NODE* assignment) {
+    const bool is_step = assignment && assignment->op != ASG;
+    const bool is_plain = assignment && !is_left_in_middle && !(is_step && tree_has_side_effects(assignment->right));
+    if (is_step) {
+        OPT_ASSERT(!c->events.empty() && c->events.back().cell == cell && c->events.back().kind == EVENT::USE);
+        if (is_plain)
+            c->events.back().is_step = true;
+        else
+            c->events.pop_back(); // it stays what it is
+    }
+    push(c, is_plain ? EVENT::DEF : EVENT::KILL);
+}
+
+// ---- Loads
+
+class LOAD_PROMOTER {
+public:
+    LOAD_PROMOTER(const MOTION_GRAPH& graph, const std::vector<int>& first_stop, PROMOTION_TEMPS& temps, bool benign)
+        : graph(graph), first_stop(first_stop), temps(temps), benign(benign), loops(*currfuninfo->loops) {}
+    void run(const std::vector<CANDIDATE*>& batch, bool is_global);
+    // What the batches decided: assignments take their places.
+    bool finish();
+
+private:
+    void fill_sets(size_t k);
+    void fill_block(size_t k, size_t begin, size_t end);
+    void add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted, const std::vector<CANDIDATES>& known);
+    const BBLK* place_ahead(const CANDIDATE& c, const EVENT& use, const NATURAL_LOOP* loop) const;
+    void decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known);
+    bool decide_reads(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& known, VALUE_LIFE& life);
+    void decide_saves(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end);
+    void rewrite(CANDIDATE& c);
+    void rewrite_use(CANDIDATE& c, EVENT& e);
+    void rewrite_step(CANDIDATE& c, EVENT& use, EVENT& def);
+    void store_behind(CANDIDATE& c, EVENT& def, NODE* value);
+    void tell(const char* what, const CANDIDATE& c, const EVENT& e);
+    NODE* load(CANDIDATE& c) {
+        return mk_ASG(mk_NAME(temps.of(c)), copy_tree(c.reference));
+    }
+    template <class F>
+    static void for_each_block(CANDIDATE& c, F&& visit) {
+        for (size_t begin = 0, end; begin < c.events.size(); begin = end) {
+            for (end = begin + 1; end < c.events.size() && c.events[end].block == c.events[begin].block;) ++end;
+            visit(c.events[begin].block, begin, end);
+        }
+    }
+
+    const MOTION_GRAPH& graph;
+    const std::vector<int>& first_stop;
+    PROMOTION_TEMPS& temps;
+    const bool benign;
+    const NATURAL_LOOPS& loops;
+    std::vector<CANDIDATE*> batch;
+    std::unique_ptr<MOTION> motion;
+    std::unordered_map<const LIST*, std::vector<NODE*>> ahead; // statements to come ahead of one; looked up, never walked
+    std::vector<bool> has_ahead;                               // by block
+    EDGE_STATEMENTS on_edges;
+    bool any = false;
+};
+
+void LOAD_PROMOTER::fill_block(size_t k, size_t begin, size_t end) {
+    const CANDIDATE& c = *batch[k];
+    const CANDIDATES bit = CANDIDATES(1) << k;
+    const size_t b = c.events[begin].block;
+    MOTION_SETS& s = motion->sets[b];
+    for (size_t i = begin; i < end; ++i) {
+        const EVENT& e = c.events[i];
+        if (e.kind == EVENT::USE) {
+            if (e.is_conditional) continue;
+            if (s.demands & bit && !(c.may_trap() && e.order > first_stop[b])) s.first |= bit;
+            s.last |= bit;
+            continue;
+        }
+        s.demands &= ~bit;
+        s.passes &= ~bit;
+        if (e.kind == EVENT::DEF)
+            s.last |= bit;
+        else
+            s.last &= ~bit;
+    }
+}
+
+void LOAD_PROMOTER::fill_sets(size_t k) {
+    CANDIDATE& c = *batch[k];
+    const CANDIDATES bit = CANDIDATES(1) << k;
+    for (size_t b : graph.order) {
+        MOTION_SETS& s = motion->sets[b];
+        s.passes |= bit;
+        s.demands |= bit;
+        s.first &= ~bit;
+        s.last &= ~bit;
+    }
+    for_each_block(c, [&](size_t, size_t begin, size_t end) { fill_block(k, begin, end); });
+    for (size_t header : c.cut) motion->sets[header].cut |= bit;
+    if (!c.may_trap()) return;
+    for (size_t b : graph.order)
+        if (first_stop[b] != INT32_MAX) motion->sets[b].demands &= ~bit;
+}
+
+// Where a load ahead of the loop stands for one in each iteration; null: there is no such place, or something in the loop
+// may change what it reads.
+const BBLK* LOAD_PROMOTER::place_ahead(const CANDIDATE& c, const EVENT& use, const NATURAL_LOOP* loop) const {
+    if (!loop->is_reducible) return nullptr;
+    for (const EVENT& e : c.events) {
+        const BBLK* bb = graph.blocks[e.block];
+        if (e.kind == EVENT::USE || !loops.contains(loop, bb)) continue;
+        if (e.kind == EVENT::KILL) return nullptr;
+        const bool is_behind = e.block == use.block ? e.order >= use.order : loops.dominates(graph.blocks[use.block], bb);
+        if (!is_behind) return nullptr;
+    }
+    const BBLK* place = nullptr;
+    for (const EDGE* p = loop->header->predecessors; p; p = p->rest) {
+        if (loops.contains(loop, p->first)) continue;
+        if (place || p->first->successors->rest) return nullptr;
+        place = p->first;
+    }
+    return place;
+}
+
+void LOAD_PROMOTER::add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted,
+                                     const std::vector<CANDIDATES>& known) {
+    CANDIDATE& c = *batch[k];
+    const CANDIDATES bit = CANDIDATES(1) << k;
+    std::vector<size_t> places;
+    for (const EVENT& e : c.events) {
+        if (e.kind != EVENT::USE || e.is_conditional) continue;
+        const BBLK* bb = graph.blocks[e.block];
+        for (const NATURAL_LOOP* loop = loops.around(bb); loop && loops.dominates_latches(bb, loop); loop = loop->parent) {
+            const BBLK* place = place_ahead(c, e, loop);
+            if (!place) break;
+            const size_t at = static_cast<size_t>(place->dfn), header = static_cast<size_t>(loop->header->dfn);
+            const MOTION_SETS& s = motion->sets[at];
+            const bool is_known = (s.last | (known[at] & s.passes)) & bit;
+            if (!is_known && !(wanted[header] & bit) && !(motion->sets[header].cut & bit)) places.push_back(at);
+        }
+    }
+    std::sort(places.begin(), places.end());
+    places.erase(std::unique(places.begin(), places.end()), places.end());
+    for (size_t at : places) {
+        EVENT load{EVENT::USE, at, INT32_MAX, nullptr, nullptr};
+        c.events.insert(std::upper_bound(c.events.begin(), c.events.end(), load,
+                                         [](const EVENT& a, const EVENT& b) { return a.block < b.block; }),
+                        load);
+    }
+    if (!places.empty()) fill_sets(k);
+}
+
+void LOAD_PROMOTER::run(const std::vector<CANDIDATE*>& candidates, bool is_global) {
+    batch = candidates;
+    motion = std::make_unique<MOTION>(graph);
+    for (size_t k = 0; k < batch.size(); ++k) fill_sets(k);
+    if (!is_global) return decide(motion->no_insertions(), std::vector<CANDIDATES>(graph.blocks.size(), 0));
+    for (size_t b : graph.order)
+        for (size_t p : graph.before[b])
+            if (!EDGE_STATEMENTS::may_insert(graph.blocks[p], graph.blocks[b])) motion->sets[b].closed = ~CANDIDATES(0);
+    if (benign && !loops.inner_first().empty()) {
+        const std::vector<CANDIDATES> wanted = motion->anticipated(), known = motion->available(motion->no_insertions());
+        for (size_t k = 0; k < batch.size(); ++k)
+            if (!batch[k]->may_trap()) add_benign_loads(k, wanted, known);
+    }
+    const INSERTIONS inserted = motion->latest_insertions_off_back_edges(loops);
+    decide(inserted, motion->available(inserted));
+}
+
+// Which reads have their value, and so go.
+bool LOAD_PROMOTER::decide_reads(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& known, VALUE_LIFE& life) {
+    bool any_deleted = false;
+    for_each_block(c, [&](size_t b, size_t begin, size_t end) {
+        bool is_known = known[b] & bit, is_local = false, is_set = false;
+        for (size_t i = begin; i < end; ++i) {
+            EVENT& e = c.events[i];
+            if (e.kind == EVENT::USE) {
+                e.is_deleted = is_known;
+                e.is_local = is_local;
+                any_deleted |= is_known && e.link;
+                if (is_known && e.link && !is_set) life.reads[b] |= bit;
+                if (e.is_conditional || is_known) continue;
+            }
+            is_known = e.kind != EVENT::KILL;
+            is_local = is_set = true;
+        }
+        if (is_set) life.sets[b] |= bit;
+    });
+    return any_deleted;
+}
+
+// Which loads and stores set the temporary: those whose value is read from it.
+void LOAD_PROMOTER::decide_saves(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end) {
+    for_each_block(c, [&](size_t b, size_t begin, size_t end) {
+        bool is_live = live_at_end[b] & bit;
+        for (size_t i = end; i-- > begin;) {
+            EVENT& e = c.events[i];
+            if (e.kind == EVENT::USE && e.is_deleted)
+                is_live |= e.link != nullptr;
+            else if (!e.is_conditional) {
+                e.is_saved = is_live && e.kind != EVENT::KILL;
+                is_live = false;
+            }
+        }
+    });
+}
+
+void LOAD_PROMOTER::decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known) {
+    VALUE_LIFE life(*motion);
+    CANDIDATES changed = 0;
+    for (size_t k = 0; k < batch.size(); ++k)
+        if (decide_reads(*batch[k], CANDIDATES(1) << k, known, life)) changed |= CANDIDATES(1) << k;
+    if (!changed) return;
+    life.edge_sets = inserted;
+    const std::vector<CANDIDATES> live = life.live_at_end(graph);
+    for (size_t k = 0; k < batch.size(); ++k) {
+        const CANDIDATES bit = CANDIDATES(1) << k;
+        if (!(changed & bit)) continue;
+        any = true;
+        decide_saves(*batch[k], bit, live);
+        rewrite(*batch[k]);
+    }
+    for (size_t b : graph.order)
+        for (size_t i = 0; i < graph.before[b].size(); ++i) {
+            const CANDIDATES read = changed & inserted[b][i] & (life.reads[b] | (live[b] & ~life.sets[b]));
+            if (!read) continue;
+            BBLK *from = graph.blocks[graph.before[b][i]], *to = graph.blocks[b];
+            for (size_t k = 0; k < batch.size(); ++k) {
+                if (!(read >> k & 1)) continue;
+                debug_printf("   %s SSA RP load inserted in BB%d:\t%s\n", "Global", from->dfn,
+                             tree_to_infix(batch[k]->reference).c_str());
+                on_edges.add(from, to, load(*batch[k]));
+            }
+        }
+}
+
+// ---- The trees
+
+void LOAD_PROMOTER::tell(const char* what, const CANDIDATE& c, const EVENT& e) {
+    if (!print_debug) return;
+    if (std::strcmp(what, "deleted") == 0)
+        debug_printf("   %s SSA RP load deleted in BB%d:\t%s\t<==  %s\n", e.is_local ? "Local" : "Global",
+                     graph.blocks[e.block]->dfn, tree_to_infix(c.reference).c_str(), temps.of(c)->name);
+    else
+        debug_printf("   %s SSA RP load inserted in BB%d:\t%s\n", "Global", graph.blocks[e.block]->dfn,
+                     tree_to_infix(c.reference).c_str());
+}
+
+void LOAD_PROMOTER::rewrite_use(CANDIDATE& c, EVENT& e) {
+    if (!e.link) { // a benign load, which another one may have made needless
+        if (!e.is_saved) return;
+        tell("inserted", c, e);
+        return insert_at_end_of_body(graph.blocks[e.block], load(c));
+    }
+    if (!e.is_deleted && !e.is_saved) return;
+    NODE* use = *e.link;
+    *e.link = coerce_to_type(use->type->stqs(), mk_NAME(temps.of(c), use->ls));
+    note_changed_statement(e.cell);
+    if (e.is_deleted) {
+        tell("deleted", c, e);
+        return erase_tree(use);
+    }
+    ahead[e.cell].push_back(mk_ASG(mk_NAME(temps.of(c), use->ls), use));
+    has_ahead.resize(graph.blocks.size(), false);
+    has_ahead[e.block] = true;
+}
+
+// The statement gives its value to the temporary, and a new one behind it stores that.
+void LOAD_PROMOTER::store_behind(CANDIDATE& c, EVENT& def, NODE* assignment) {
+    NODE** link = &def.cell->first;
+    while (*link != assignment) link = &(*link)->left;
+    NODE *place = assignment->left, *stores = def.cell->first;
+    NODE* store = maketree(ASG, place, mk_NAME(temps.of(c), place->ls), assignment->type, assignment->ls);
+    assignment->left = mk_NAME(temps.of(c), place->ls);
+    if (link == &def.cell->first)
+        stores = store;
+    else
+        *link = store;
+    def.cell->first = assignment;
+    note_changed_statement(def.cell);
+    note_changed_statement(insert_behind(def.cell, stores, def.cell->psn));
+}
+
+void LOAD_PROMOTER::rewrite_step(CANDIDATE& c, EVENT& use, EVENT& def) {
+    if (!use.is_deleted && !def.is_saved) return;
+    if (use.is_deleted)
+        tell("deleted", c, use);
+    else {
+        ahead[use.cell].push_back(load(c));
+        has_ahead.resize(graph.blocks.size(), false);
+        has_ahead[use.block] = true;
+    }
+    NODE* assignment = below_SSA(def.cell->first);
+    assignment->left = remove_SSA_operators_in_tree(assignment->left);
+    store_behind(c, def, assignment);
+}
+
+void LOAD_PROMOTER::rewrite(CANDIDATE& c) {
+    for (size_t i = 0; i < c.events.size(); ++i) {
+        EVENT& e = c.events[i];
+        if (e.kind == EVENT::USE && e.is_step)
+            rewrite_step(c, e, c.events[i + 1]), ++i;
+        else if (e.kind == EVENT::USE)
+            rewrite_use(c, e);
+        else if (e.kind == EVENT::DEF && e.is_saved)
+            store_behind(c, e, below_SSA(e.cell->first));
+    }
+}
+
+bool LOAD_PROMOTER::finish() {
+    for (size_t b = 1; b < has_ahead.size(); ++b) {
+        if (!has_ahead[b]) continue;
+        LIST** pragmas = nullptr; // those that speak of what follows
+        for (LIST** link = &graph.blocks[b]->statements; *link; link = &(*link)->rest) {
+            LIST* cell = *link;
+            auto it = ahead.find(cell);
+            if (it != ahead.end()) {
+                LIST** at = pragmas ? pragmas : link;
+                for (NODE* t : it->second) at = insert_before(at, t, cell->psn);
+                while (*link != cell) link = &(*link)->rest;
+            }
+            if (cell->first->op != PPRAGMA)
+                pragmas = nullptr;
+            else if (!pragmas)
+                pragmas = link;
+        }
+    }
+    on_edges.insert();
+    return any;
+}
+
+// ---- The registers of loops
+
+// Of the values that live through a loop the best ones keep their place; the others are not kept across its header.
+void spare_registers(const std::vector<CANDIDATE*>& candidates, const MOTION_GRAPH& graph,
+                     const FREQUENCIES& frequencies) {
+    const NATURAL_LOOPS& loops = *currfuninfo->loops;
+    struct VALUE {
+        double weight;
+        CANDIDATE* c;
+    };
+    std::unordered_map<const NATURAL_LOOP*, std::vector<VALUE>> values; // looked up, never walked
+    std::unordered_map<const NATURAL_LOOP*, double> own;                // of one candidate; below 0: it may change
+    std::vector<const NATURAL_LOOP*> seen;
+    for (CANDIDATE* c : candidates) {
+        own.clear();
+        seen.clear();
+        for (const EVENT& e : c->events)
+            for (const NATURAL_LOOP* l = loops.around(graph.blocks[e.block]); l; l = l->parent) {
+                auto [at, is_new] = own.try_emplace(l, 0);
+                if (is_new) seen.push_back(l);
+                if (e.kind == EVENT::KILL) at->second = -1;
+                if (at->second >= 0) at->second += frequencies.of(graph.blocks[e.block]);
+            }
+        for (const NATURAL_LOOP* l : seen)
+            if (own[l] > 0) values[l].push_back({own[l], c});
+    }
+    for (const auto& l : loops.inner_first()) {
+        std::vector<VALUE>& all = values[l.get()];
+        if (all.size() <= MOST_VALUES_IN_LOOP) continue;
+        std::stable_sort(all.begin(), all.end(), [](const VALUE& a, const VALUE& b) { return a.weight > b.weight; });
+        for (size_t i = MOST_VALUES_IN_LOOP; i < all.size(); ++i)
+            all[i].c->cut.push_back(static_cast<size_t>(l->header->dfn));
+    }
+}
+
+// ---- A sweep
+
+bool is_worth_it(const CANDIDATE& c, const MOTION_GRAPH& graph) {
+    size_t accesses = 0;
+    bool is_read = false, is_in_loop = false;
+    for (const EVENT& e : c.events) {
+        if (e.kind == EVENT::KILL) continue;
+        ++accesses;
+        is_read |= e.kind == EVENT::USE;
+        is_in_loop |= currfuninfo->loops->around(graph.blocks[e.block]) != nullptr;
+    }
+    return is_read && (accesses > 1 || is_in_loop);
+}
+
+std::vector<std::unique_ptr<CANDIDATE>> find_candidates() {
+    std::vector<std::unique_ptr<CANDIDATE>> found;
+    for (const auto& v : ssa_variables())
+        if (is_candidate(v.get())) found.push_back(std::make_unique<CANDIDATE>(v.get()));
+    return found;
+}
+
+bool promote_loads(const std::vector<std::unique_ptr<CANDIDATE>>& all, PROMOTION_TEMPS& temps, bool with_assertions) {
+    need(fact::loops);
+    const MOTION_GRAPH graph(false);
+    const COLLECTOR collector(all, graph, with_assertions);
+    const FREQUENCIES frequencies;
+    std::vector<CANDIDATE*> candidates;
+    if (print_debug) debug_printf("\n\nSSA RP candidate variables:\n");
+    for (const auto& c : all) {
+        if (!c->reference) continue;
+        if (print_debug) debug_printf("\t%s\n", tree_to_infix(c->reference).c_str());
+        for (const EVENT& e : c->events)
+            if (e.kind != EVENT::KILL) c->weight += frequencies.of(graph.blocks[e.block]);
+        if (is_worth_it(*c, graph)) candidates.push_back(c.get());
+    }
+    std::stable_sort(candidates.begin(), candidates.end(),
+                     [](const CANDIDATE* a, const CANDIDATE* b) { return a->weight > b->weight; });
+    spare_registers(candidates, graph, frequencies);
+    LOAD_PROMOTER promoter(graph, collector.first_stop, temps, with_assertions);
+    size_t blocks = 0;
+    for (size_t i = 0; i < candidates.size(); i += MOST_CANDIDATES) {
+        const auto end = candidates.begin() + static_cast<long>(std::min(i + MOST_CANDIDATES, candidates.size()));
+        blocks += graph.blocks.size();
+        promoter.run({candidates.begin() + static_cast<long>(i), end}, blocks <= MOST_BLOCKS_OF_BATCHES);
+    }
+    return promoter.finish();
+}
+
+bool sweep(PROMOTION_TEMPS& temps, bool with_assertions, bool with_stores) {
+    construct_SSA_form(false, false, false);
+    if (!function_is_in_SSA_form) return false;
+    bool any = false;
+    {
+        const std::vector<std::unique_ptr<CANDIDATE>> candidates = find_candidates();
+        if (!candidates.empty()) any = promote_loads(candidates, temps, with_assertions);
+        if (!candidates.empty() && with_stores) any |= promote_stores(candidates, temps);
+    }
+    deconstruct_SSA_form();
+    if (!any) return false;
+    sym_split(currfuninfo);
+    changed(fact::graph | fact::alias_marks);
+    return true;
+}
+
+} // namespace
+
+bool promote_vars_to_registers(bool with_assertions) {
+    if (!currfuninfo || !currfuninfo->bb_list || !currfuninfo->stack_is_laid_out) return false;
+    if (function_saves_environment() || TEST_FLAG(currfuninfo, FUN_is_interrupt)) return false;
+    if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'promote_SSA_vars_to_registers' ------\n");
+    PROMOTION_TEMPS temps;
+    bool any = sweep(temps, with_assertions, false);
+    any |= sweep(temps, with_assertions, true);
+    if (any) promote_all_embedded_assignments();
+    return any;
+}

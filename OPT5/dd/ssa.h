@@ -164,8 +164,8 @@ void propagate_SSA_constants(int passes);
 void eliminate_dead_SSA_assignments();
 void clone_SSA_NASSERTs();
 void hoist_SSA_region_constants();
-// With two forms of its own.
-void promote_vars_to_registers(bool withAssertions);
+// With two forms of its own. Whether anything was promoted.
+bool promote_vars_to_registers(bool withAssertions);
 // Write their line to the debug stream, and have no effect.
 void split_live_SSA_ranges();
 void coalesce_SSA_variables();

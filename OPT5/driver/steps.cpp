@@ -157,6 +157,14 @@ struct LOOP* root() {
     return currfuninfo->bb_list ? currfuninfo->bb_list->loop : nullptr;
 }
 
+// What the hierarchy knows of loops is not true of them any more where something was promoted.
+void promote_to_registers(bool with_assertions) {
+    if (pass_debug_bare_SSA)
+        in_SSA_form<false>([] {});
+    else if (promote_vars_to_registers(with_assertions))
+        drop_hierarchy();
+}
+
 template <class F>
 void with_hierarchy(F work) {
     if (root()) work();
@@ -229,7 +237,7 @@ const ROW steps[] = {
     /* 20 */ {F, "non-DD clone SSA NASSERTs", nullptr, L2_with_assertions, [] { in_SSA_form<true>(clone_SSA_NASSERTs); }, none, graph | alias_marks},
     /* 21 */ {F, "non-DD SSA CP", nullptr, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(1); }); }, none, graph | alias_marks},
     /* 22 */ {F, "non-DD SSA EDA", nullptr, L2, [] { in_SSA_form<true>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
-    /* 23 */ {L, "SSA RP with benign loads", nullptr, L2, [] { promote_vars_to_registers(true); }, none, none},
+    /* 23 */ {F, "SSA RP with benign loads", nullptr, L2, [] { promote_to_registers(true); }, none, graph},
     /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
     /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
     /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
@@ -239,7 +247,7 @@ const ROW steps[] = {
     /* 30 */ {F, "SSA_NASSERTs", &N, L2_with_assertions, [] { in_SSA_form<false>(clone_SSA_NASSERTs); }, none, graph | alias_marks},
     /* 31 */ {F, "SSA_propagate", &D, L2, [] { in_SSA_form<false>([] { propagate_SSA_constants(3); }); }, none, graph | alias_marks},
     /* 32 */ {F, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
-    /* 33 */ {L, "SSA_reg_promote", &N, L2, [] { promote_vars_to_registers(false); }, none, none},
+    /* 33 */ {F, "SSA_reg_promote", &N, L2, [] { promote_to_registers(false); }, none, graph | alias_marks},
     /* 34 */ {F, "loop_assertions", &D, L2_with_loops, [] { with_hierarchy([] { find_loop_assertions(nullptr); }); }, none, graph | alias_marks},
     /* 35 */ {F, "sink_unused_definitions", &D, L2_with_loops, [] { with_hierarchy(sink_definitions); }, none, graph | alias_marks},
     /* 36 */ {L, "undeltafy", &D, L2, [] { undeltafy_dd_loops(root()); }, none, none},
@@ -266,7 +274,7 @@ const ROW steps[] = {
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},
     /* 58 */ {F, "SSA_propagate_vector", &D, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(3); }); }, none, graph | alias_marks},
     /* 59 */ {F, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
-    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_vars_to_registers(false); }, none, graph},
+    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_to_registers(false); }, none, graph},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
     /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},

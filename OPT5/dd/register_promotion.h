@@ -1,0 +1,66 @@
+// What the two halves of register promotion share: candidates, and the temporaries that hold their values.
+#pragma once
+
+#include "OPT5/dd/code_motion.h"
+#include "OPT5/dd/ssa.h"
+#include "OPT5/ir/list.h"
+
+#include <memory>
+
+class NATURAL_LOOPS;
+struct NATURAL_LOOP;
+class FREQUENCIES;
+
+// A place where a candidate is accessed, or where what it holds may change.
+struct PROMOTION_EVENT {
+    enum KIND : uint8_t { USE, DEF, KILL };
+    KIND kind;
+    size_t block;
+    int order;     // of the statement in its block
+    LIST* cell;    // the statement; null: a load that is to be made at the end of the block
+    NODE** link;   // of a USE: holds the SSA_USE
+    bool is_conditional = false; // it is not certain that the statement evaluates it
+    bool is_step = false;        // the read of the compound assignment that the next event is
+    // What was decided.
+    bool is_deleted = false, is_saved = false, is_local = false;
+};
+
+struct PROMOTION_CANDIDATE {
+    explicit PROMOTION_CANDIDATE(SSAVAR* v) : variable(v) {}
+    ~PROMOTION_CANDIDATE();
+    PROMOTION_CANDIDATE(const PROMOTION_CANDIDATE&) = delete;
+    PROMOTION_CANDIDATE& operator=(const PROMOTION_CANDIDATE&) = delete;
+
+    SSAVAR* variable;
+    NODE* reference = nullptr; // a copy of one without SSA operators, as the trees of the function are now; owned
+    std::vector<PROMOTION_EVENT> events; // by block and place
+    std::vector<size_t> cut; // headers of loops that have no register for it
+    double weight = 0;       // how often it is accessed
+    bool may_trap() const { return variable->pointer != nullptr; }
+};
+
+// The temporary of each place, one for all of its accesses: whenever it is read it holds what the place holds.
+class PROMOTION_TEMPS {
+public:
+    SYMTAB* of(const PROMOTION_CANDIDATE& c);
+    bool made_any() const { return !entries.empty(); }
+
+private:
+    struct ENTRY {
+        const SYMTAB* base;
+        bool is_indirect;
+        INT65 start, length;
+        SYMTAB* temp;
+    };
+    std::vector<ENTRY> entries;
+};
+
+constexpr size_t MOST_VALUES_IN_LOOP = 12; // that a loop has registers for
+// Blocks of the graph times batches: what is beyond is promoted within blocks alone. Time stays linear.
+constexpr size_t MOST_BLOCKS_OF_BATCHES = 400000;
+
+// A call that does not come back, or an event that others outside the program wait for.
+bool may_leave_in_the_middle(const NODE* statement);
+
+// Stores of the candidates that another store makes needless, and those that move behind loops. Whether any changed.
+bool promote_stores(const std::vector<std::unique_ptr<PROMOTION_CANDIDATE>>& candidates, PROMOTION_TEMPS& temps);

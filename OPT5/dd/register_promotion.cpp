@@ -275,8 +275,13 @@ const BBLK* LOAD_PROMOTER::place_ahead(const CANDIDATE& c, const EVENT& use, con
         if (!is_behind) return nullptr;
     }
     const BBLK* place = nullptr;
+    const bool tests_first = edge_length(loop->header->successors) > 1;
     for (const EDGE* p = loop->header->predecessors; p; p = p->rest) {
-        if (loops.contains(loop, p->first)) continue;
+        if (loops.contains(loop, p->first)) {
+            // The test will move to the end, and a copy of it ahead of the loop: then a load between is safe.
+            if (tests_first && !p->first->successors->rest) return nullptr;
+            continue;
+        }
         if (place || p->first->successors->rest) return nullptr;
         place = p->first;
     }

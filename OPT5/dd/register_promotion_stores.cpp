@@ -178,6 +178,13 @@ void STORE_PROMOTER::find_points(STORED& s) {
     }
 }
 
+bool has_no_exit(const NATURAL_LOOP& loop, const NATURAL_LOOPS& loops) {
+    for (const BBLK* bb : loop.blocks)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (!loops.contains(&loop, e->first)) return false;
+    return true;
+}
+
 // A path that never comes to a return would overwrite everything: it ends at the header of the loop that has no exit, or,
 // where cycles are no natural loops, wherever no return is reached.
 void STORE_PROMOTER::find_dead_ends() {
@@ -193,9 +200,10 @@ void STORE_PROMOTER::find_dead_ends() {
     for (size_t i = 0; i < waiting.size(); ++i)
         for (size_t p : forward.before[waiting[i]]) enter(p);
     for (size_t b : forward.order) {
+        if (returns[b]) continue;
         const NATURAL_LOOP* loop = loops.around(forward.blocks[b]);
         const bool is_header = loop && loop->header == forward.blocks[b];
-        is_dead_end[b] = !returns[b] && (is_header || loops.has_other_cycles());
+        is_dead_end[b] = loops.has_other_cycles() || (is_header && has_no_exit(*loop, loops));
     }
 }
 
@@ -319,7 +327,8 @@ void STORE_PROMOTER::rewrite_store(STORED& s, POINT& p) {
                          stmt2infix(t).c_str());
     }
     const SYMTAB* temp = p.is_saved ? temps.of(*s.c) : nullptr;
-    const bool is_mirrored = temp && t->right->op == NAME && t->right->u.sym == temp;
+    const NODE* value = below_SSA(static_cast<const NODE*>(t->right));
+    const bool is_mirrored = temp && value->op == NAME && value->u.sym == temp;
     if (!p.is_deleted && (!p.is_saved || is_mirrored)) return;
     NODE* place = t->left;
     if (p.is_deleted && (!p.is_saved || is_mirrored)) {

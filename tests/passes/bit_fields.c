@@ -30,8 +30,8 @@ int calls;
 int next(void) { return calls++ & 1; }
 
 // FUNCTION: reads
-// HAS: $O$N0 = *((unsigned int *)p + 1)
-// HAS: return ((int)($O$N0 << 7) >> 7) + (int)(*(unsigned int *)p >> 1 & 3) + ((int)$O$N0 >> 9)
+// HAS: /^\S+ = \*\(\(unsigned int \*\)p \+ 1\)$/
+// HAS: /^return \(\(int\)\(\S+ << 7\) >> 7\) \+ \(int\)\(\*\(unsigned int \*\)p >> 1 & 3\) \+ \(\(int\)\S+ >> 9\)$/
 int reads(struct flags *p) { return p->d + p->b + p->e; }
 
 // Neighbouring stores to one container are one.

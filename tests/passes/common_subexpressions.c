@@ -1,5 +1,5 @@
 // What a block, or a chain of blocks, computes again is taken from a variable; nothing is computed that was not.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
 #include <zrun.h>
 
 int g, h, a[20];

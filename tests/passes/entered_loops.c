@@ -1,5 +1,5 @@
 // A loop whose counter starts from a constant is entered behind its first test.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
 #include <zrun.h>
 
 int g[40], n = 3;

@@ -1,6 +1,6 @@
 // Stores to a part that a later store covers go, as do those to objects that no one reads any more; loads of a part that
 // is known to hold a variable's value take that.
-// RUN: --opt_level=2 --disable_inlining --debug:skip=lcse
+// RUN: --opt_level=2 --disable_inlining --debug:skip=lcse+ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
 #include <zrun.h>
 
 struct pair {

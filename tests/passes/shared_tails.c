@@ -1,5 +1,5 @@
 // Blocks that end the function alike are written once.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
 #include <zrun.h>
 
 int g, h;

@@ -1,5 +1,5 @@
 // A variable that is set once and read once in a block goes, and its value is computed where it is read.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
 #include <zrun.h>
 
 int g[16], total;

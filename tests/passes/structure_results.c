@@ -1,5 +1,5 @@
 // A structure that a call returns goes to the local that it is passed on to, if nothing else sees either.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
 #include <zrun.h>
 
 struct six {

@@ -1,0 +1,238 @@
+// Scalars in memory that are read or written again and again are kept in temporaries.
+// RUN: --opt_level=2 --disable_inlining
+// LEVELS: 1 3 4
+#include <zrun.h>
+#include <stdlib.h>
+
+struct state {
+    long sum;
+    int count, last;
+    unsigned char small;
+};
+struct state st;
+int g, h, a[16];
+unsigned u;
+float f;
+const int fixed = 7;
+volatile int port;
+union { long l; int i[2]; } un;
+
+int bump(void) { return ++g; }
+void end_if(int x) {
+    if (!x) return;
+    put_i16(g);
+    exit(0);
+}
+
+// ---- What moves
+
+// FUNCTION: global_sum
+// COUNT 1: = _g
+// COUNT 1: _g =
+int global_sum(int n) {
+    int i;
+    for (i = 0; i < n; i++) g += a[i];
+    return 0;
+}
+
+// FUNCTION: members
+// COUNT 2: .sum
+// COUNT 2: .count
+// COUNT 1: .last
+void members(struct state *p, int n) {
+    int i = 0;
+    do {
+        p->sum += i;
+        p->count++;
+        p->last = i * 5;
+    } while (++i < n);
+}
+
+// FUNCTION: within_endless_loop
+// COUNT 1: = _h
+// COUNT 1: _h =
+void within_endless_loop(void) {
+    int i;
+    for (;;) {
+        for (i = 0; i < 16; i++) h += a[i];
+        if (h > 500) end_if(h);
+    }
+}
+
+// An iteration reads h once ahead of the test that may leave the loop: one load ahead of it may be one too many.
+// FUNCTION: benign
+// COUNT 1: _h
+int benign(int n) {
+    int i = 0, s = 0;
+    while (a[i] != n) {
+        s += h;
+        if (s > 1000) break;
+        i++;
+    }
+    return s;
+}
+
+// FUNCTION: overwritten
+// COUNT 1: _g =
+void overwritten(int x) {
+    g = x;
+    if (x & 1) h = 5;
+    g = x + 1;
+}
+
+// FUNCTION: partly_known
+// COUNT 2: *p
+int partly_known(int *p, int x) {
+    int y = 0;
+    if (x) y = *p;
+    return y * 2 + *p;
+}
+
+// The value is what the store left of it.
+// FUNCTION: converted
+// COUNT 0: = _u
+// COUNT 0: = _f
+int converted(struct state *p, double d, long l) {
+    int x;
+    f = d;
+    x = f == d ? 1 : 2;
+    u = l;
+    x += u / 3;
+    p->small = l;
+    return x * 10 + p->small;
+}
+
+// ---- What stays
+
+int stored_in_some(int *p, const int *m, int n) {
+    int i;
+    for (i = 0; i < n; i++)
+        if (m[i]) *p = i;
+    return p ? *p : -1;
+}
+
+int read_in_some(const int *p, int n) {
+    int i, s = 0;
+    for (i = 0; i < n; i++)
+        if (p) s += *p;
+    return s;
+}
+
+int read_behind_exit(const int *p, int n) {
+    int i, s = 0;
+    for (i = 0; i < n; i++) {
+        s += i;
+        if (!p) return s;
+        s += *p;
+    }
+    return s;
+}
+
+int aliased(int *p, int *q, int n) {
+    int i, r;
+    g = 1;
+    *p = 2;
+    r = g;
+    for (i = 0; i < n; i++) {
+        *q += i;
+        g += *p;
+    }
+    return r * 100 + g;
+}
+
+// FUNCTION: polled
+// COUNT 2: _g
+int polled(int n) {
+    g = 0;
+    while (port < n) g++, port = g;
+    return g;
+}
+
+struct cell {
+    int key;
+    struct cell *next;
+};
+int follow(struct cell *p) {
+    int s = p->key;
+    while (p->next) {
+        p->key += 1;
+        p = p->next;
+        s += p->key;
+    }
+    return s;
+}
+
+int parts(int x) {
+    struct state copy;
+    un.l = 0x10002;
+    x += un.i[1] * 3 + un.i[0];
+    st.last = x;
+    copy = st;
+    st.last = 2;
+    st = copy;
+    x += st.last;
+    un.i[0] = 5;
+    return x + (un.l == 5 || un.l == 0x50001);
+}
+
+int two_entries(int n) {
+    int i = 0;
+    if (n & 1) goto inside;
+again:
+    g += i;
+inside:
+    h += g;
+    i++;
+    if (i < n) goto again;
+    return g;
+}
+
+int many_exits(int n) {
+    int i;
+    for (i = 0;; i++) {
+        g = i;
+        if (a[i & 15] == n) return 1;
+        switch (n - i) {
+        case 3: return g;
+        case 9: continue;
+        }
+        g = i * 2;
+        if (i > 20) break;
+    }
+    return g + h;
+}
+
+int constant(int n, int *p) {
+    int i, s = 0;
+    for (i = 0; i < n; i++) {
+        s += fixed;
+        if (p != &fixed) *p = i;
+    }
+    return s;
+}
+
+int main(void) {
+    struct cell c[3] = {{1, c + 1}, {2, c + 2}, {3, 0}};
+    int i, zeros[4] = {0};
+    for (i = 0; i < 16; i++) a[i] = i * 3;
+    global_sum(9), global_sum(0);
+    put_i16(g);
+    members(&st, 7);
+    put_i32(st.sum + st.count * 1000L + st.last);
+    put_i16(benign(9) + benign(0) + benign(45));
+    overwritten(4);
+    put_i16(g * 10 + partly_known(&g, 1) + partly_known(&g, 0));
+    put_i16(converted(&st, 0.1, 70000L + 513));
+    put_i16(stored_in_some(0, zeros, 4) + stored_in_some(&g, a, 4));
+    put_i16(read_in_some(0, 5) + read_in_some(a + 2, 5));
+    put_i16(read_behind_exit(0, 5) + read_behind_exit(a + 2, 5));
+    put_i16(aliased(&g, &h, 3) + aliased(&h, &g, 3) + aliased(a, a, 2));
+    put_i16(polled(5));
+    put_i16(follow(c) * 10 + c[0].key + c[1].key);
+    put_i16(parts(4));
+    put_i16(two_entries(4) + two_entries(5) + h);
+    put_i16(many_exits(6) + many_exits(2000) + many_exits(5) + g);
+    put_i16(constant(3, &i) + constant(0, 0));
+    within_endless_loop();
+    return 0;
+}

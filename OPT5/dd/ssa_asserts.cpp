@@ -5,6 +5,7 @@
 // dominates the assertion, no other execution of that definition can lie between.
 #include "OPT5/dd/ssa.h"
 
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
@@ -35,8 +36,10 @@ private:
                 NODE* clone = with_source(copy_tree(s->first), use, source);
                 if (is_known(s, clone->left))
                     erase_tree(clone);
-                else
+                else {
                     last = insert_behind(last, clone, s->psn);
+                    changed(fact::graph | fact::alias_marks);
+                }
             }
         return last;
     }

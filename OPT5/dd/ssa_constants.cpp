@@ -406,6 +406,11 @@ void propagate_SSA_constants(int passes) {
     if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'propagate_SSA_constants' ---------\n");
     need(fact::dominators);
     PROPAGATION propagation;
-    for (int i = 1; i <= std::min(passes, MOST_PASSES); ++i)
-        if (!propagation.run(i) && i > 1) break;
+    bool any = false;
+    for (int i = 1; i <= std::min(passes, MOST_PASSES); ++i) {
+        const bool has_changed = propagation.run(i);
+        any |= has_changed;
+        if (!has_changed && i > 1) break;
+    }
+    if (any) changed(fact::graph | fact::alias_marks);
 }

@@ -12,6 +12,7 @@
 
 #include "OPT5/alias/effects.h"
 #include "OPT5/dd/loop.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
@@ -36,6 +37,7 @@ public:
             follow(definition);
         }
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) sweep(bb);
+        if (has_changed) changed(fact::graph | fact::alias_marks);
     }
 
 private:
@@ -181,6 +183,7 @@ private:
     }
 
     NODE* effects_of(const LIST* s, const BBLK* bb) {
+        has_changed = true;
         NODE* t = s->first;
         if (print_debug)
             debug_printf("\nPurging dead subtree at line %ld in BB%d:\n\t%s\n", s->psn ? s->psn->line : 0L, bb->dfn,
@@ -217,6 +220,7 @@ private:
     std::vector<int> of_version;            // the candidate that the definition is of, or -1
     std::vector<CANDIDATE> candidates;
     std::vector<NODE*> work; // definitions
+    bool has_changed = false;
 };
 
 } // namespace

@@ -38,8 +38,9 @@ namespace {
 constexpr int LEAST_GOAL = 4;      // of `size_speed_goal`
 constexpr int MOST_NODES = 64;     // of an expression
 constexpr int MOST_COST = 999;     // blocks that all temporaries live through
+constexpr int MOST_TEMPORARIES = 6; // of a loop
 constexpr int SMALL_LOOP = 9;      // blocks
-constexpr int64_t MOST_STATEMENTS = 200000; // that are asked whether they change a load
+constexpr int64_t MOST_STATEMENTS = 20000; // that are asked whether they change a load
 
 // A region constant expression.
 struct RCX {
@@ -177,19 +178,40 @@ private:
         if (lvalue_is_volatile(t)) return false;
         const READ_SET reads(t);
         if (!reads.is_complete()) return false;
+        return is_kept(reads, loop);
+    }
+
+    bool is_kept(const READ_SET& reads, struct LOOP* loop) {
         for (BBLK* bb : loop->contents) {
             if (bb->loop != loop) {
-                if (!is_kept(t, bb->loop)) return false;
+                if (!is_kept(reads, bb->loop)) return false;
                 continue;
             }
-            for (const LIST* s = bb->statements; s; s = s->rest) {
-                if (s->first->op == SSA_PHI) continue;
-                if (--statements_left < 0 || reads.may_be_changed_by(s->first)) return false;
-            }
+            for (const NODE* t : writers_in(bb))
+                if (--statements_left < 0 || reads.may_be_changed_by(t)) return false;
         }
         return true;
     }
 
+    // The statements of the block that write to anything but variables of their own: what is not tracked is no such
+    // variable, or a part of one.
+    const std::vector<const NODE*>& writers_in(const BBLK* bb) {
+        WRITERS& in = writers[bb];
+        if (in.is_known) return in.statements;
+        in.is_known = true;
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            bool writes = false;
+            for_each_write(s->first, [&writes](const WRITE& w) { writes |= !w.place || !is_private_name(below_SSA(w.place)); });
+            if (writes && s->first->op != SSA_PHI) in.statements.push_back(s->first);
+        }
+        return in.statements;
+    }
+
+    struct WRITERS {
+        std::vector<const NODE*> statements;
+        bool is_known = false;
+    };
+    SIDE_TABLE<WRITERS> writers;
     int64_t statements_left = MOST_STATEMENTS;
 };
 
@@ -250,11 +272,14 @@ public:
             if (weigh(*rcx)) queue.push(rcx.get());
         if (print_debug) queue.dump();
         int cost = 0;
-        while (RCX* rcx = queue.pop()) {
-            if ((cost += rcx->cost) > MOST_COST) return;
+        for (RCX* rcx = queue.pop(); rcx; rcx = queue.pop()) {
+            if (++hoisted_from[rcx->common_loop] > MOST_TEMPORARIES) continue;
+            if ((cost += rcx->cost) > MOST_COST) break;
             hoist(*rcx);
         }
+        if (cost == 0) return;
         sym_split(currfuninfo);
+        changed(fact::graph | fact::alias_marks);
     }
 
 private:
@@ -416,6 +441,7 @@ private:
     CERTAINTY certainty;
     std::vector<std::unique_ptr<RCX>> all;
     std::unordered_map<size_t, std::vector<RCX*>> by_hash; // looked up alone
+    std::unordered_map<const struct LOOP*, int> hoisted_from;  // by the common loop; looked up alone
     RCX::INSTANCE here = {};
     bool is_conditional = false;
 };

@@ -6,6 +6,7 @@
 #include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
+#include "OPT5/dd/ssa.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
@@ -28,6 +29,15 @@ enum KEPT : uint8_t { NOTHING, FORM, CHANGED_FORM } kept = NOTHING;
 void enter_form() {
     if (kept != NOTHING) return;
     normalize_all_trees();
+    changed(fact::graph | fact::alias_marks);
+}
+
+void enter_SSA() {
+    if (function_is_in_SSA_form) return;
+    if (pass_debug_bare_SSA)
+        enter_and_leave_SSA_form(false, false, true);
+    else
+        construct_SSA_form(false, false, true);
 }
 
 void begin(bool force) {
@@ -47,7 +57,12 @@ void end_of_changes() { kept = CHANGED_FORM; }
 
 } // namespace
 
+register_option pass_debug_bare_SSA("debug:bare_SSA");
+
+void leave_kept_SSA_form() { deconstruct_SSA_form(); }
+
 void leave_kept_form() {
+    leave_kept_SSA_form();
     if (kept == NOTHING) return;
     if (kept == CHANGED_FORM)
         denormalize_all_trees(false, true);
@@ -93,6 +108,17 @@ const FRAME D_where_loops_are = {[] {
                                      if (trees_are_normalized) end();
                                  }};
 const FRAME N = {enter_form, end};
+const FRAME S = {enter_SSA, [] {}, true};
+const FRAME D_and_S = {[] {
+                           if (!function_is_in_SSA_form) begin(false);
+                           enter_SSA();
+                       },
+                       end, true};
+const FRAME N_and_S = {[] {
+                           if (!function_is_in_SSA_form) enter_form();
+                           enter_SSA();
+                       },
+                       end, true};
 const FRAME N_and_no_hierarchy = {[] {
                                       if (has_hierarchy()) enter_form();
                                   },

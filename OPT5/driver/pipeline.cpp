@@ -46,6 +46,7 @@ bool has_work(const ROW& row) {
 
 void do_work(const ROW& row, const std::string& label) {
     if (!has_work(row)) return;
+    if (!row.frame || pass_debug_idle_frames || !row.frame->is_SSA_form) leave_kept_SSA_form();
     if (!row.frame || pass_debug_idle_frames) leave_kept_form();
     if (row.frame) {
         row.frame->begin();

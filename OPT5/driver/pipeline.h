@@ -16,6 +16,7 @@
 struct FRAME {
     void (*begin)();
     void (*end)();
+    bool is_SSA_form = false; // which stays for the next such row
 };
 
 struct ROW {

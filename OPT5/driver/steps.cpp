@@ -140,16 +140,6 @@ void global_CSE() {
     clean_up_assert_RELOPs();
 }
 
-register_option pass_debug_bare_SSA("debug:bare_SSA"); // into SSA form and out of it, with no work on it
-
-template <bool VECTORS_TOO, class F>
-void in_SSA_form(F work) {
-    if (pass_debug_bare_SSA) return enter_and_leave_SSA_form(false, false, VECTORS_TOO);
-    construct_SSA_form(false, false, VECTORS_TOO);
-    work();
-    deconstruct_SSA_form();
-}
-
 // ---- Actions on loops
 
 // The root of the hierarchy, null without one.
@@ -160,7 +150,7 @@ struct LOOP* root() {
 // What the hierarchy knows of loops is not true of them any more where something was promoted.
 void promote_to_registers(bool with_assertions) {
     if (pass_debug_bare_SSA)
-        in_SSA_form<false>([] {});
+        enter_and_leave_SSA_form(false, false, false);
     else if (promote_vars_to_registers(with_assertions))
         drop_hierarchy();
 }
@@ -207,6 +197,7 @@ constexpr ROW::KIND F = ROW::FUNCTION, B = ROW::BARRIER, L = ROW::IDLE;
 using fact::alias;
 using fact::alias_marks;
 using fact::dominators;
+using fact::every;
 using fact::graph;
 using fact::live_variables;
 using fact::none;
@@ -234,19 +225,19 @@ const ROW steps[] = {
     /* 17 */ {L, "intraprocedural MVP", nullptr, L2, intraprocedural_MVP, none, none},
     /* 18 */ {L, "value propagation for SIMD", nullptr, L2_and_SIMD, value_propagation_for_SIMD, none, none},
     /* 19 */ {F, "explode auto structs", nullptr, L2, explode_auto_struct_vars, none, graph},
-    /* 20 */ {F, "non-DD clone SSA NASSERTs", nullptr, L2_with_assertions, [] { in_SSA_form<true>(clone_SSA_NASSERTs); }, none, graph | alias_marks},
-    /* 21 */ {F, "non-DD SSA CP", nullptr, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(1); }); }, none, graph | alias_marks},
-    /* 22 */ {F, "non-DD SSA EDA", nullptr, L2, [] { in_SSA_form<true>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
+    /* 20 */ {F, "non-DD clone SSA NASSERTs", &S, L2_with_assertions, clone_SSA_NASSERTs, none, every},
+    /* 21 */ {F, "non-DD SSA CP", &S, L2, [] { propagate_SSA_constants(1); }, none, every},
+    /* 22 */ {F, "non-DD SSA EDA", &S, L2, eliminate_dead_SSA_assignments, none, every},
     /* 23 */ {F, "SSA RP with benign loads", nullptr, L2, [] { promote_to_registers(true); }, none, graph},
     /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
     /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
     /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
     /* 28 */ {F, "forward_substitution", &DF, L2_with_loops, nothing, none, graph | alias_marks},
-    /* 29 */ {F, "SSA_hoist", &D, L2_with_loops_for_speed, [] { in_SSA_form<true>(hoist_SSA_region_constants); }, none, graph | alias_marks},
-    /* 30 */ {F, "SSA_NASSERTs", &N, L2_with_assertions, [] { in_SSA_form<false>(clone_SSA_NASSERTs); }, none, graph | alias_marks},
-    /* 31 */ {F, "SSA_propagate", &D, L2, [] { in_SSA_form<false>([] { propagate_SSA_constants(3); }); }, none, graph | alias_marks},
-    /* 32 */ {F, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
+    /* 29 */ {F, "SSA_hoist", &D_and_S, L2_with_loops_for_speed, hoist_SSA_region_constants, none, every},
+    /* 30 */ {F, "SSA_NASSERTs", &N_and_S, L2_with_assertions, clone_SSA_NASSERTs, none, every},
+    /* 31 */ {F, "SSA_propagate", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
+    /* 32 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},
     /* 33 */ {F, "SSA_reg_promote", &N, L2, [] { promote_to_registers(false); }, none, graph | alias_marks},
     /* 34 */ {F, "loop_assertions", &D, L2_with_loops, [] { with_hierarchy([] { find_loop_assertions(nullptr); }); }, none, graph | alias_marks},
     /* 35 */ {F, "sink_unused_definitions", &D, L2_with_loops, [] { with_hierarchy(sink_definitions); }, none, graph | alias_marks},
@@ -272,8 +263,8 @@ const ROW steps[] = {
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {L, "value_propagation", &D, L2, value_propagation, none, none},
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},
-    /* 58 */ {F, "SSA_propagate_vector", &D, L2, [] { in_SSA_form<true>([] { propagate_SSA_constants(3); }); }, none, graph | alias_marks},
-    /* 59 */ {F, "SSA_deadasg", &N, L2, [] { in_SSA_form<false>(eliminate_dead_SSA_assignments); }, none, graph | alias_marks},
+    /* 58 */ {F, "SSA_propagate_vector", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
+    /* 59 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},
     /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_to_registers(false); }, none, graph},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
     /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},

@@ -103,6 +103,7 @@ struct QUESTION {
     const NODE *v1, *v2;
     struct LOOP *l1, *l2;
     bool assumeRC = false;
+    bool byType = true;
     int spec = 0;
     int order = 0;
     bool early = false;  // only the vector in that order is wanted
@@ -121,7 +122,7 @@ public:
         if (!apply_promises(v.get())) return nullptr;
         for (int k = 1; k <= std::min<int>(q.sameLevels, common->level); ++k) v->ddve(k).clr_FWD_BWD_dirs();
         if (q.early) v = make_feasible(std::move(v), q.order, q.is_one_access());
-        if (!v || !lvalues_may_be_aliased(q.v1, q.v2, loop_of_differences(*v))) return nullptr;
+        if (!v || !lvalues_may_be_aliased(q.v1, q.v2, loop_of_differences(*v), q.byType)) return nullptr;
         if (!limit_by_trips(v.get())) return nullptr;
         if (lvalue_is_volatile(q.v1) || lvalue_is_volatile(q.v2)) return v;
         const REFERENCE *a = reference_of(q.v1), *b = reference_of(q.v2);
@@ -182,7 +183,7 @@ bool is_in_irreducible_code(const struct LOOP* l1, const struct LOOP* l2) {
 
 // Of irreducible code all iterations count as one of the function's body, in which either may come first.
 void compute_dependence_vectors(DDEP_PTR* fwd, DDEP_PTR* bwd, int order, const NODE* v1, struct LOOP* l1,
-                                const NODE* v2, struct LOOP* l2, bool assumeRC, int spec) {
+                                const NODE* v2, struct LOOP* l2, bool assumeRC, int spec, bool byType) {
     require_lvalue(v1);
     require_lvalue(v2);
     if (is_in_irreducible_code(l1, l2)) {
@@ -193,6 +194,7 @@ void compute_dependence_vectors(DDEP_PTR* fwd, DDEP_PTR* bwd, int order, const N
     QUESTION q{v1, v2, l1, l2};
     q.assumeRC = assumeRC;
     q.spec = spec;
+    q.byType = byType;
     q.order = sign_of(order);
     q.early = !bwd;
     if (spec > 0 && l1 == l2) q.sameLevels = l1->level - spec;

@@ -41,9 +41,10 @@ struct LOOP* get_loop_from_DDEPNODE_tree(const NODE* tree); // null without a re
 // loop of that level around both. `order`: above 0, `v1` comes first in one iteration; below, `v2`; 0: not known.
 // `*fwd` is the vector of dependences from `v1` to `v2`, made feasible in that order; `*bwd`, where `bwd` is not null,
 // of those from `v2` to `v1`. `assumeRC`: the caller vouches that the bases do not change between the two. `spec` above 0:
-// only the innermost `spec` loops are taken to carry a dependence.
+// only the innermost `spec` loops are taken to carry a dependence. `byType`: accesses of types that tell them apart are
+// independent, as they are where a load is to see what a store has stored.
 void compute_dependence_vectors(DDEP_PTR* fwd, DDEP_PTR* bwd, int order, const NODE* v1, struct LOOP* l1,
-                                const NODE* v2, struct LOOP* l2, bool assumeRC, int spec);
+                                const NODE* v2, struct LOOP* l2, bool assumeRC, int spec, bool byType = true);
 // The vector with the distances of both orders.
 DDEP_PTR compute_full_dependence_vector(const NODE* v1, struct LOOP* l1, const NODE* v2, struct LOOP* l2);
 // Both in `loop` or in loops within: the distances at its level, dependences that outer loops carry left out.

@@ -7,6 +7,7 @@
 // exceptions, objects that the linker or the frame lays over others, are taken for unknown ones here.
 #include "OPT5/dd/dependence_graph.h"
 
+#include "OPT5/alias/alias.h"
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/dependence.h"
 #include "OPT5/dd/loop.h"
@@ -85,8 +86,8 @@ void make_dd_node_list(NODE* statement, struct LOOP* loop, std::vector<DD_CELL>&
 
 namespace {
 
-// The object that a reference is known to lie in, no other being laid over it; null where that is not known.
-const SYMTAB* known_object(const DD_CELL& cell) {
+// The object that a reference is known to lie in; null where that is not known.
+const SYMTAB* declared_object(const DD_CELL& cell) {
     const NODE* t = without_members(static_cast<const NODE*>(cell.place));
     if (t->op == UMULT) {
         t = t->left;
@@ -94,10 +95,14 @@ const SYMTAB* known_object(const DD_CELL& cell) {
         if (t->op != UAND) return nullptr;
         t = without_members(static_cast<const NODE*>(t->left));
     }
-    if (t->op != NAME) return nullptr;
-    const SYMTAB* s = t->u.sym;
-    const bool may_lie_over_others = s->lives_in_others || s->hosts_others || s->level == 1 || s->pragma;
-    return may_lie_over_others ? nullptr : s;
+    return t->op == NAME ? t->u.sym : nullptr;
+}
+bool is_declared_object(const DD_CELL& cell) { return declared_object(cell) != nullptr; }
+
+// The same, where no other object is laid over it.
+const SYMTAB* known_object(const DD_CELL& cell) {
+    const SYMTAB* s = declared_object(cell);
+    return !s || s->lives_in_others || s->hosts_others || s->level == 1 || s->pragma ? nullptr : s;
 }
 
 bool is_string(const DD_CELL& cell) {
@@ -200,32 +205,73 @@ private:
     uint64_t pairs = 0;
 };
 
-// Blocks, each behind those that precede it in an iteration: the text may have another order.
-std::vector<BBLK*> blocks_in_order() {
+// Blocks of a loop, each behind those that precede it in an iteration; a loop in it counts as one block there, and stands as
+// a whole ahead of what follows it. The text may have another order.
+class ITERATION_ORDER {
+public:
     std::vector<BBLK*> order;
-    std::unordered_set<const BBLK*> seen{currfuninfo->bb_list}; // membership only
-    std::vector<std::pair<BBLK*, const EDGE*>> path{{currfuninfo->bb_list, currfuninfo->bb_list->successors}};
-    while (!path.empty()) {
-        auto& [bb, edge] = path.back();
-        if (!edge) {
-            order.push_back(bb);
-            path.pop_back();
-            continue;
+
+    void add(struct LOOP* loop) {
+        std::vector<BBLK*> finished; // the heads of loops stand for them
+        std::unordered_set<const BBLK*> seen{loop->head}; // membership only
+        std::vector<VISIT> path{visit(loop->head, loop, true)};
+        while (!path.empty()) {
+            VISIT& at = path.back();
+            if (at.next.empty()) {
+                finished.push_back(at.bb);
+                path.pop_back();
+                continue;
+            }
+            BBLK* next = at.next.back();
+            at.next.pop_back();
+            if (seen.insert(next).second) path.push_back(visit(next, loop, false));
         }
-        BBLK* next = edge->first;
-        edge = edge->rest;
-        if (seen.insert(next).second) path.push_back({next, next->successors});
+        for (auto bb = finished.rbegin(); bb != finished.rend(); ++bb)
+            if ((*bb)->loop == loop)
+                order.push_back(*bb);
+            else
+                add(child_around(*bb, loop));
     }
-    std::reverse(order.begin(), order.end());
-    return order;
-}
+
+private:
+    struct VISIT {
+        BBLK* bb;
+        std::vector<BBLK*> next;
+    };
+    // The loop directly in `loop` that holds the block.
+    static struct LOOP* child_around(const BBLK* bb, const struct LOOP* loop) {
+        struct LOOP* l = bb->loop;
+        while (l->parent != loop) l = l->parent;
+        return l;
+    }
+    VISIT visit(BBLK* bb, struct LOOP* loop, bool is_head) {
+        VISIT v{bb, {}};
+        struct LOOP* whole = bb->loop == loop || is_head ? nullptr : child_around(bb, loop);
+        const auto add_successors = [&](const BBLK* from) {
+            for (const EDGE* e = from->successors; e; e = e->rest) {
+                BBLK* to = e->first;
+                if (!to->loop || !loop_is_subloop_of_loop(to->loop, loop, true)) continue;
+                if (whole && loop_is_subloop_of_loop(to->loop, whole, true)) continue;
+                v.next.push_back(to->loop == loop ? to : child_around(to, loop)->head);
+            }
+        };
+        if (!whole)
+            add_successors(bb);
+        else
+            for (struct LOOP* l : loops_outer_first(whole))
+                for (const BBLK* in : l->contents)
+                    if (in->loop == l) add_successors(in);
+        std::reverse(v.next.begin(), v.next.end());
+        return v;
+    }
+};
 
 std::vector<DD_CELL> references_in(struct LOOP* loop) {
     std::vector<DD_CELL> cells;
-    for (BBLK* bb : blocks_in_order()) {
-        if (!bb->loop || !loop_is_subloop_of_loop(bb->loop, loop, true)) continue;
+    ITERATION_ORDER blocks;
+    blocks.add(loop);
+    for (BBLK* bb : blocks.order)
         for (LIST* s = bb->statements; s; s = s->rest) make_dd_node_list(s->first, bb->loop, cells);
-    }
     cells.erase(std::remove_if(cells.begin(), cells.end(), is_string), cells.end());
     return cells;
 }
@@ -284,7 +330,7 @@ void DDGRAPH::build(struct LOOP* loop, bool all_vectors, int spec) {
         const DD_CELL &a = found[x], &b = found[y];
         if (!a.is_store && !b.is_store) return;
         const int order = x == y ? order_in_itself(a) : static_cast<int>(y - x);
-        add_dependencies(a.place, a.loop, b.place, b.loop, order);
+        relate(a, b, order);
     };
     for (size_t x : all) {
         if (classes[x] == 0) {
@@ -300,10 +346,34 @@ void DDGRAPH::build(struct LOOP* loop, bool all_vectors, int spec) {
 }
 
 void DDGRAPH::add_dependencies(NODE* v1, struct LOOP* l1, NODE* v2, struct LOOP* l2, int order) {
+    relate({v1, v1, l1, true}, {v2, v2, l2, true}, order);
+}
+
+namespace {
+
+// Memory without a declared type takes that of what is stored last: by its type a load alone tells that it does not see
+// a store. What is stored there later, or was loaded before, may have any type.
+struct TYPED_APART {
+    bool forward = false, backward = false; // no dependence from the first to the second, from the second to the first
+};
+TYPED_APART apart_by_type(const DD_CELL& a, const DD_CELL& b) {
+    if (lvalues_may_be_aliased(a.place, b.place, loop_root())) return {};
+    if (is_declared_object(a) || is_declared_object(b)) return {true, true};
+    if (!lvalues_may_be_aliased(a.place, b.place, loop_root(), false)) return {true, true};
+    return {!b.is_store, !a.is_store};
+}
+
+} // namespace
+
+void DDGRAPH::relate(const DD_CELL& a, const DD_CELL& b, int order) {
+    NODE *v1 = a.place, *v2 = b.place;
+    struct LOOP *l1 = a.loop, *l2 = b.loop;
     const bool is_same = v1 == v2;
     if (is_same && l1->is_root() && !l1->irreducible) return;
+    const TYPED_APART apart = apart_by_type(a, b);
+    if (apart.forward && apart.backward) return;
     const auto compute = [&](int spec, DDEP_PTR* forward, DDEP_PTR* backward) {
-        compute_dependence_vectors(forward, backward, order, v1, l1, v2, l2, false, spec);
+        compute_dependence_vectors(forward, backward, order, v1, l1, v2, l2, false, spec, false);
         if (is_same) backward->reset();
     };
     DDEP_PTR forward, backward, fast_forward, fast_backward;
@@ -314,7 +384,7 @@ void DDGRAPH::add_dependencies(NODE* v1, struct LOOP* l1, NODE* v2, struct LOOP*
     for (const bool back : {false, true}) {
         DDEP_PTR& vector = back ? backward : forward;
         NODE *from = back ? v2 : v1, *to = back ? v1 : v2;
-        if (!vector) continue;
+        if (!vector || (back ? apart.backward : apart.forward)) continue;
         DDEP_PTR second = speculates ? speculation(*vector, std::move(back ? fast_backward : fast_forward)) : nullptr;
         add_dep_edge(from, to, std::move(vector));
         if (second) add_dep_edge(from, to, std::move(second));

@@ -62,6 +62,7 @@ private:
     using GRAPH = boost::adjacency_list<boost::setS, boost::vecS, boost::bidirectionalS, NODE*, size_t>;
     using VERTEX = GRAPH::vertex_descriptor;
 
+    void relate(const DD_CELL& a, const DD_CELL& b, int order);
     VERTEX vertex_of(NODE* place, struct LOOP* loop);
     // The edge, if there is one.
     std::pair<GRAPH::edge_descriptor, bool> edge_between(const NODE* from, const NODE* to) const;

@@ -1,7 +1,7 @@
 // From a unit to the compiled form: places of objects, initial memory, code of functions.
 #pragma once
 
-#include "tools/exec/machine.h"
+#include "tools/exec/dependences.h"
 #include "tools/exec/ops.h"
 
 #include <deque>
@@ -124,6 +124,7 @@ private:
     std::vector<TRIP_PROMISE> promised;                     // of the loop whose head comes next
     std::string keyword;                                    // and its keyword in the source
     uint32_t loop = NO_LOOP;                                // the statements that come are in
+    std::unordered_map<const IC_NODE*, ACCESS> numbered;    // accesses of a function with dependences
 
     // compile_expr.cpp
     const XNODE* build(const IC_NODE* n);
@@ -155,6 +156,8 @@ private:
     XNODE* field_access(EVAL (*pick)(BASE), const LVALUE& lv, const XNODE* b);
     void count_load(const LVALUE& lv);
     void count_store(const LVALUE& lv);
+    LVALUE plain_lvalue(const IC_NODE* n);
+    LVALUE noted(const LVALUE& lv, const ACCESS& numbered);
     void settle(LVALUE& lv); // an address outside its object is checked when it is used
     const XNODE* load(const LVALUE& lv);
     const XNODE* assign(const IC_NODE* n);
@@ -185,5 +188,6 @@ private:
     uint32_t target(uint32_t label);
     void promise(const PRAGMA& pragma);
     void enter_loop(uint32_t id, uint32_t line);
+    void find_numbers(const IC_NODE* n);
     void resolve();
 };

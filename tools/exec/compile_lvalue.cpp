@@ -121,8 +121,37 @@ LVALUE COMPILER::part(const IC_NODE* n) {
     return through(p.node(binary_eval(op::PLUS, R_U32), address(lv), offset), s);
 }
 
+// The address is noted as it is computed: of a store that is behind its value.
+LVALUE COMPILER::noted(const LVALUE& lv, const ACCESS& numbered) {
+    ACCESS* access = p.make<ACCESS>();
+    *access = numbered;
+    access->rep = lv.shape.rep;
+    access->bit = lv.is_field ? lv.bit : 0;
+    access->width = lv.is_field ? lv.width : lv.shape.units * 16;
+    XNODE* note = p.node(
+        [](const XNODE* x, MACHINE& m) {
+            const int64_t at = run(x->a, m);
+            if (m.top->accesses)
+                m.top->accesses->note(*static_cast<const ACCESS*>(x->extra), static_cast<uint64_t>(at), m);
+            return at;
+        },
+        address(lv));
+    note->extra = access;
+    LVALUE there = lv;
+    there.base = B_EXPR;
+    there.k = 0;
+    there.address = note;
+    return there;
+}
+
 LVALUE COMPILER::lvalue(const IC_NODE* n) {
     n = strip_marks(n);
+    const LVALUE lv = plain_lvalue(n);
+    const auto found = numbered.find(n);
+    return found == numbered.end() ? lv : noted(lv, found->second);
+}
+
+LVALUE COMPILER::plain_lvalue(const IC_NODE* n) {
     if (folded) folded->push_back(static_cast<uint16_t>(n->op));
     cost++;
     if (++depth > deepest) deepest = depth;

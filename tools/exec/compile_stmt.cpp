@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <string_view>
 #include <unordered_set>
 
 namespace {
@@ -24,6 +25,11 @@ void collect_addressed(const IC_NODE* n, std::unordered_set<const IC_SYMBOL*>& a
     }
 }
 
+bool writes_left(int o) {
+    const std::string_view name = if_node_info[o].name;
+    const bool assigns = name.size() > 2 && name.substr(name.size() - 3) == "ASG";
+    return assigns || o == op::PLUSPLUS || o == op::MINMIN || o == op::ENDLOOP;
+}
 int64_t count_down(const XNODE* x, MACHINE& m) { return run(x->a, m) == 0; }
 } // namespace
 
@@ -90,8 +96,22 @@ void COMPILER::switch_table() {
     f->code.back().table = &table;
 }
 
+// The accesses below the marks of a tree. What is written stands left of an assignment, perhaps below parts of it.
+void COMPILER::find_numbers(const IC_NODE* n) {
+    for (; n; n = n->left) {
+        if (n->op == op::DDNODE) numbered.insert({strip_marks(n), {n->number, false}});
+        if (writes_left(n->op)) {
+            const IC_NODE* place = n->left;
+            while (place && place->op != op::DDNODE && place->op != op::UMULT && place->op != op::NAME) place = place->left;
+            if (place && place->op == op::DDNODE) numbered.insert({strip_marks(place), {place->number, true}});
+        }
+        find_numbers(n->right);
+    }
+}
+
 void COMPILER::statement(const IC_NODE* n, uint32_t line) {
     n = strip_marks(n);
+    if (f->dependences) find_numbers(n);
     cost = 1;
     if (n->op == op::LOOP) {
         if (const IC_NODE* l = strip_marks(n->right); l && l->op == op::LABEL) define(l->number);
@@ -235,7 +255,10 @@ void COMPILER::function() {
             if (item.tree) statement(item.tree, line);
             break;
         case IFR_LABEL: define(item.number); break;
-        case IFR_EHT_HEADER: exception_table = &item; break;
+        case IFR_EHT_HEADER:
+            exception_table = &item;
+            f->dependences = nullptr;
+            break;
         case IFR_PRAGMA:
             if (p.options.check) promise(*item.pragma);
             break;
@@ -243,7 +266,14 @@ void COMPILER::function() {
             if (p.options.check) {
                 const uint32_t* w = item.facts->word;
                 f->loops.push_back({w[0], w[1], w[2], w[3], w[4]});
+                if (!f->dependences) f->dependences = std::make_shared<DEPENDENCES>();
             }
+            break;
+        case IFR_DEP_VECTOR:
+            if (f->dependences) f->dependences->add_vector(item.facts);
+            break;
+        case IFR_DEP_EDGE:
+            if (f->dependences) f->dependences->add_edge(item.facts->word[0], item.facts->word[1], item.facts->word[2]);
             break;
         case IFR_LOOP_VAR: enter_loop(item.facts->word[0], line); break;
         case IFR_ASM:
@@ -262,6 +292,8 @@ void COMPILER::function() {
     const std::string fault = bind_loop_records(*f);
     if (!fault.empty()) throw EXEC_ERROR{EXEC_TRIPS, fault + " (in " + f->name + ", line " + std::to_string(f->code.front().line) + ")"};
     find_promised_loops(*f);
+    if (numbered.empty()) f->dependences = nullptr;
+    if (f->dependences) f->dependences->find_nests(f->code);
     f->frame = (f->frame + 3) & ~uint64_t{3};
     f->depth = deepest;
 }

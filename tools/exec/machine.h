@@ -111,6 +111,9 @@ struct LOOP_RECORD {
     uint32_t id, outer, min, max, multiple;
 };
 
+class DEPENDENCES;
+class ACCESS_WATCH;
+
 struct FUNCTION {
     IC_SYMBOL* sym = nullptr;
     const IC_FUNC* source = nullptr;
@@ -126,6 +129,7 @@ struct FUNCTION {
     std::vector<HANDLING> handling;     // the exception table, the root first; empty without one
     std::vector<LOOP_RECORD> loops;     // of one as well
     std::vector<uint32_t> loop_of;      // the id of the innermost loop around each statement, or NO_LOOP
+    std::shared_ptr<DEPENDENCES> dependences; // of a checked run with numbered accesses
 };
 
 struct LIBRARY_ENTRY;
@@ -143,6 +147,7 @@ struct ACTIVATION {
     const STMT* at;
     ACTIVATION* up;
     uint32_t eh_entry = 0; // of the call in work
+    ACCESS_WATCH* accesses = nullptr;
 };
 
 struct EXEC_ERROR {

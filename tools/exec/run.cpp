@@ -1,11 +1,13 @@
 // The run: activations and their statements, from main to the exit status.
 #include "tools/exec/compile.h"
+#include "tools/exec/dependences.h"
 #include "tools/exec/report.h"
 #include "tools/exec/trips.h"
 
 #include "UTIL/big_stack.h"
 
 #include <algorithm>
+#include <optional>
 
 namespace {
 constexpr size_t host_stack = size_t{2} << 30; // touched only as needed
@@ -22,6 +24,16 @@ uint32_t find_case(const SWITCH_TABLE& table, int64_t v) {
 struct NO_WATCH {
     explicit NO_WATCH(const FUNCTION&) {}
     void step(uint32_t, uint32_t, MACHINE&) {}
+};
+
+// Of one whose annotations are checked.
+struct CHECKS {
+    explicit CHECKS(const FUNCTION& f) : trips(f) {}
+    void step(uint32_t from, uint32_t to, MACHINE& m) {
+        trips.step(from, to, m);
+        if (m.top->accesses) m.top->accesses->step(from, to);
+    }
+    TRIP_WATCH trips;
 };
 
 // Cleans up along the chain of the call that an exception left. The statement of its handler, or false.
@@ -132,10 +144,12 @@ int64_t MACHINE::invoke(FUNCTION& f, const int64_t* args, const SHAPE* shapes, s
     ACTIVATION here{&f, nullptr, top};
     top = &here;
     returned = 0;
-    if (f.promises.empty())
+    std::optional<ACCESS_WATCH> accesses;
+    if (f.dependences) here.accesses = &accesses.emplace(*f.dependences);
+    if (f.promises.empty() && !f.dependences)
         run_statements<NO_WATCH>(f, here, *this);
     else
-        run_statements<TRIP_WATCH>(f, here, *this);
+        run_statements<CHECKS>(f, here, *this);
     top = here.up;
     fp = old_fp;
     sp = old_sp;

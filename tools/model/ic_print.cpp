@@ -147,8 +147,8 @@ void LISTING::facts(int kind, const IC_FACTS& f) {
     case IFR_DEP_VECTOR:
         std::fprintf(out_m, "dependence vector %u, flags %02x:", w[0], f.flags);
         for (DD_ENTRY e : f.elements) {
-            std::fprintf(out_m, " %s%s%s", e.direction & 2 ? "<" : "", e.direction & 4 ? "=" : "",
-                         e.direction & 8 ? ">" : "");
+            std::fprintf(out_m, " %s%s%s", e.direction & 2 ? ">" : "", e.direction & 4 ? "=" : "",
+                         e.direction & 8 ? "<" : "");
             if (e.direction & 1) std::fprintf(out_m, "%d", e.distance);
             if (e.direction & 16) std::fputs("(overflows)", out_m);
         }
@@ -210,10 +210,12 @@ void LISTING::item(const IC_ITEM& i, size_t local) {
 }
 
 void LISTING::body() {
-    size_t local = 0;
+    size_t local = 0, first = 0;
     for (const IC_ITEM& i : unit_m.items) {
+        const size_t at = static_cast<size_t>(&i - unit_m.items.data());
         if (i.kind == IFR_BEGIN_FUNC) {
             local = 0;
+            first = at;
             std::fprintf(out_m, "\nfunction %s: %s", i.sym->name,
                          i.sym->type ? i.sym->type->printstr().c_str() : "no type");
             if (options_m.positions) {
@@ -225,6 +227,8 @@ void LISTING::body() {
         }
         item(i, local);
         if (i.kind == IFR_SYMBOL) local++;
+        if (i.kind == IFR_END_FUNC)
+            for (const std::string& line : ic_dependence_words(unit_m, first, at)) std::fprintf(out_m, "%s\n", line.c_str());
     }
 }
 

@@ -11,5 +11,8 @@ struct IC_PRINT_OPTIONS {
 void ic_print_unit(FILE* out, const IC_UNIT& unit, const IC_PRINT_OPTIONS& options);
 // One expression or statement, without a line end. Recurses as deep as the tree is.
 std::string ic_expr_text(const IC_NODE* tree, const IC_PRINT_OPTIONS& options);
+// For each loop that the items from `first` to `last`, of one function, have a record of: what keeps its iterations apart as
+// far as memory is concerned, in lines. Empty without records.
+std::vector<std::string> ic_dependence_words(const IC_UNIT& unit, size_t first, size_t last);
 // The control flow of each function as a Graphviz graph.
 void ic_print_dot(FILE* out, const IC_UNIT& unit);

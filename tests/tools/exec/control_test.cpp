@@ -170,4 +170,47 @@ TEST_F(ControlTest, RecordsAreOfAllLoops) {
     ret(0);
     expect_error(EXEC_TRIPS, "1 loops are told of, and there are 0", checked());
 }
+
+// A loop that reads what it wrote two iterations before.
+struct EDGE_ROW {
+    uint8_t flags;
+    DD_ENTRY of_loop;
+    bool is_true;
+};
+void PrintTo(const EDGE_ROW& row, std::ostream* out) {
+    *out << int(row.flags) << ' ' << int(row.of_loop.direction) << ' ' << int(row.of_loop.distance);
+}
+class EdgeTest : public ControlTest, public testing::WithParamInterface<EDGE_ROW> {};
+
+TEST_P(EdgeTest, IsHeldAgainstTheRun) {
+    const EDGE_ROW& row = GetParam();
+    const DD_ENTRY elements[] = {{4, 0}, row.of_loop};
+    TYPE* to = pkg.mk_ptr(pkg.int_t);
+    IC_SYMBOL* a = global("_a", pkg.mk_array(pkg.int_t, false, 32, true));
+    begin(main_sym);
+    told(5, 5, 5);
+    file->if_write_dep_vector(elements, 0, row.flags, 2);
+    file->if_write_dep_edge(1, 2, 0);
+    IC_SYMBOL *i = local("i", pkg.uint_t), *sum = local("sum", pkg.int_t);
+    const auto access = [&](uint32_t id, int64_t offset) {
+        IC_NODE* place = node(PLUS, to, node(PCONV, to, node(UAND, pkg.mk_ptr(a->type), name(a))), name(i));
+        IC_NODE* mark = node(DDNODE, pkg.int_t, node(UMULT, pkg.int_t, node(PLUS, to, place, num(offset, pkg.int_t))));
+        mark->number = id;
+        return mark;
+    };
+    body();
+    statement(set(i, num(4, pkg.uint_t)));
+    loop(1, 1);
+    statement(set(sum, access(2, 2)));
+    statement(node(ASG, pkg.int_t, access(1, 0), name(sum)));
+    statement(node(ENDLOOP, pkg.uint_t, name(i), label(1)));
+    loop(0, 2);
+    if (!row.is_true) return expect_error(EXEC_CHECK, "access 2 follows access 1 of line 3 without", checked());
+    ret(0);
+    end();
+    EXPECT_EQ(run(checked()).status, 0);
+}
+INSTANTIATE_TEST_SUITE_P(Loops, EdgeTest,
+                         testing::Values(EDGE_ROW{0, {9, 2}, true}, EDGE_ROW{8, {25, 1}, true}, EDGE_ROW{0, {14, 0}, true},
+                                         EDGE_ROW{0, {9, 3}, false}, EDGE_ROW{0, {6, 0}, false}, EDGE_ROW{1, {8, 0}, false}));
 } // namespace

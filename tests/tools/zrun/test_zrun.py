@@ -57,6 +57,7 @@ class Zrun(unittest.TestCase):
         self.assertEqual(len(told), 2, told)
         self.assertRegex(told[0], r"^loop of _f: line 3 for, loop 1, \d.* iterations")
         self.assertRegex(told[1], r"^loop of _f: line 5 for, loop 2 in 1, \d.* iterations.*, MUST_ITERATE\(1, 9")
+        self.assertRegex(done.stdout, r"\nloop 1 of line 3: .*\n(    .*\n)*loop 2 of line 5: ")
         dot = subprocess.run([os.environ["ICDUMP"], "--dot", self.folder / "p.opt.if"], stdout=subprocess.PIPE, text=True).stdout
         self.assertRegex(dot, r"(?s)cluster_\d_1 \{\s*label=\"loop 1: [^}]*cluster_\d_2 \{\s*label=\"loop 2: [^}]*\}[^}]*\}")
 

@@ -130,7 +130,9 @@ private:
     std::unordered_map<const SYMTAB*, size_t> by_symbol; // looked up, never walked
 };
 
+// How many pairs may be looked at, of all and for each reference: what is in no loop gains less.
 constexpr uint64_t FREE_PAIRS = 200000, PAIRS_BY_REFERENCE = 64;
+constexpr uint64_t FREE_PAIRS_OUTSIDE = 20000, PAIRS_BY_REFERENCE_OUTSIDE = 16;
 
 struct REFERENCES {
     uint64_t loads = 0, stores = 0;
@@ -191,7 +193,9 @@ private:
         uint64_t more = pairs_in(unknown) + pairs_between(unknown, all_taken) + pairs_between(all, taken[0]);
         for (const auto& [at, mine] : own)
             if (at) more += pairs_in(mine) + pairs_between(mine, taken[at]) + pairs_between(mine, unknown);
-        if (pairs + more > FREE_PAIRS + PAIRS_BY_REFERENCE * cells_m.size()) return false;
+        const uint64_t limit = nest.depth ? FREE_PAIRS + PAIRS_BY_REFERENCE * cells_m.size()
+                                          : FREE_PAIRS_OUTSIDE + PAIRS_BY_REFERENCE_OUTSIDE * cells_m.size();
+        if (pairs + more > limit) return false;
         pairs += more;
         for (const auto& [at, mine] : own) taken[at].add(mine);
         all_taken.add(all);

@@ -150,7 +150,7 @@ TEST(records, of_the_body) {
                         "    loop 1 in 1: 2 to 4294967295 trips, a multiple of 3, flags 00fe\n"
                         "    loop 1 counts with _l, flags 03\n"
                         "    loop 2 counts with none, flags 00\n"
-                        "    dependence vector 0, flags 02: <=>-2 (overflows)\n"
+                        "    dependence vector 0, flags 02: >=<-2 (overflows)\n"
                         "    dependence vector 1, flags 04:\n"
                         "    dependence 1 -> 2 by vector 0\n"
                         "    memory bank hint 1 2 3 4 5\n"

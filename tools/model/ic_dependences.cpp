@@ -18,6 +18,7 @@ struct PLACE_OF_ACCESS {
 };
 struct LOOP_WORDS {
     uint32_t outer = 0;
+    bool has_record = false;
     long line = 0;
     bool calls = false;
     std::vector<std::string> dependences;
@@ -44,7 +45,7 @@ public:
             if (unit_m.items[i].kind == IFR_DEP_EDGE) tell(*unit_m.items[i].facts);
         std::vector<std::string> lines;
         for (const auto& [id, loop] : loops) {
-            if (loop.outer == id) continue; // the function
+            if (!loop.has_record || loop.outer == id) continue; // the function is its own outer loop
             const std::string name = "loop " + std::to_string(id) + " of line " + std::to_string(loop.line);
             const std::string calls = loop.calls ? ", calls aside" : "";
             lines.push_back(name + (loop.dependences.empty() ? ": memory does not keep its iterations apart"
@@ -57,7 +58,10 @@ public:
 private:
     void read(const IC_ITEM& item) {
         switch (item.kind) {
-        case IFR_LOOP: loops[item.facts->word[0]].outer = item.facts->word[1]; break;
+        case IFR_LOOP:
+            loops[item.facts->word[0]].outer = item.facts->word[1];
+            loops[item.facts->word[0]].has_record = true;
+            break;
         case IFR_LOOP_VAR:
             at = item.facts->word[0];
             if (!loops[at].line) loops[at].line = source_line;

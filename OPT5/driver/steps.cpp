@@ -271,7 +271,7 @@ const ROW steps[] = {
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},
     /* 64 */ {L, "global CP", nullptr, L2_with_branches, [] { unbuild_loop_hierarchy(); copyprop(1); }, none, none},
     /* 65 */ {L, "late points-to", nullptr, L2_with_branches, propagate_PT_info, none, none},
-    /* 66 */ {L, "global CSE", nullptr, L2_with_branches, global_CSE, none, none},
+    /* 66 */ {F, "global CSE", nullptr, L2_with_branches, global_CSE, none, graph},
     /* 67 */ {L, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, none, none},
     /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph},
     /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph},

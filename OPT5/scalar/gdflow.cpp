@@ -1,6 +1,292 @@
-// Not built yet: the passes leave the program as it is, and every question is answered with "not known".
+// The expressions of a function and where each is computed and changed: what global common subexpressions are found
+// from.
+//
+// Trees with one number are the same computation on the same variables and places; whether these hold the same values
+// is what the sites and the writes tell, each with its block and the position of its statement there. Nothing is kept
+// for each expression and block: an expression meets few of either.
 #include "OPT5/scalar/gdflow.h"
 
-void annotate_cfg() {}
-void clean_up_gdflow_bitvecs() {}
+#include "OPT5/alias/effects.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/scalar/lcse.h"
+#include "OPT5/scalar/subrange.h"
+#include "OPT5/scalar/triples.h"
+
+#include <boost/container_hash/hash.hpp>
+
+#include <algorithm>
+#include <unordered_map>
+
+unsigned type_code(const TYPE* t) {
+    if (t->is_pointer()) return 1;
+    if (t->is_float() && !t->is_complex()) return 2 | t->size << 4;
+    if ((t->is_int() || t->is_enum()) && !t->is_bool()) return (t->is_unsigned() ? 3u : 4u) | t->size << 4;
+    return 0;
+}
+
+size_t TREE_KEY_HASH::operator()(const TREE_KEY& k) const {
+    size_t h = 0;
+    boost::hash_combine(h, k.op);
+    boost::hash_combine(h, k.code);
+    boost::hash_combine(h, k.payload);
+    boost::hash_combine(h, k.a);
+    boost::hash_combine(h, k.b);
+    return h;
+}
+
+bool op_is_computed(int op) {
+    if (op == EXCLAIM || op == SCONV || op == PCONV || op == PMCONV) return true;
+    return op_is_arithmetic(op) || op_is_int_compare(op) || op_is_float_compare(op);
+}
+
+int weight_of_operator(const NODE* t) {
+    constexpr int DIVISION = 16;
+    if (t->op == SCONV || t->op == PCONV || t->op == ISP2CHAR || t->op == COMMA || number_of_operands[t->op] == 0)
+        return 0;
+    if (t->op == DIV || t->op == MOD) return DIVISION;
+    return t->op == UMULT || t->op == STREF ? 2 : 1;
+}
+
+bool reads_come_first(const NODE* t) {
+    auto acts = [](const NODE* n) { return n && tree_has_side_effects(n); };
+    switch (t->op) {
+    case RETURN: return !acts(t->right);
+    case IF:
+    case SWITCH: return t->left->op != ENDLOOP && !acts(t->left);
+    case CALL: return !acts(t->left) && !acts(t->right);
+    case ASG:
+        if (tree_is_arg_prolog(t) || acts(t->left)) return false;
+        return t->right->op == CALL ? reads_come_first(t->right) : !acts(t->right);
+    case STASG: return !tree_is_arg_prolog(t) && !acts(t->left) && !acts(t->right);
+    default: return is_operator_assignment(t) && t->right && !acts(t->left) && !acts(t->right);
+    }
+}
+
+void insert_statements_ahead(BBLK* bb, STATEMENTS_AHEAD& ahead) {
+    LIST** pragmas = nullptr;
+    for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
+        auto it = ahead.find(*link);
+        if (it != ahead.end()) {
+            LIST** at = pragmas ? pragmas : link;
+            LIST* statement = *link;
+            std::sort(it->second.begin(), it->second.end(),
+                      [](const KEPT& a, const KEPT& b) { return a.order < b.order; });
+            for (const KEPT& kept : it->second) at = &(*insert_before(at, kept.assignment, statement->psn));
+            while (*link != statement) link = &(*link)->rest;
+        }
+        if ((*link)->first->op != PPRAGMA)
+            pragmas = nullptr;
+        else if (!pragmas)
+            pragmas = link;
+    }
+}
+
+std::vector<TRIPLE> unique_triples;
+
+namespace {
+
+constexpr int NO_TRIPLE = -1, MOST_NODES = 64;
+
+std::unordered_map<const SYMTAB*, std::vector<TRIPLE_WRITE>> variable_writes; // looked up, never walked
+std::vector<TRIPLE_WRITE> memory_writes, staying;
+
+// The number of a tree says what it is; the triple, where it is computed.
+class ANNOTATOR {
+public:
+    void run() {
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            int position = 0;
+            for (LIST* s = bb->statements; s; s = s->rest) statement(bb, s, ++position);
+        }
+        // Blocks come in text order, their sites in order of the numbers.
+        for (TRIPLE& t : unique_triples)
+            std::stable_sort(t.sites.begin(), t.sites.end(),
+                             [](const TRIPLE_SITE& a, const TRIPLE_SITE& b) { return a.block < b.block; });
+    }
+
+private:
+    struct KNOWN {
+        int number = NO_TRIPLE;
+        double cost = 0;
+        int nodes = 1;
+    };
+
+    void statement(BBLK* bb, LIST* cell, int position);
+    void enter_writes(const BBLK* bb, const NODE* t, int position);
+    void read(NODE*& slot, bool is_certain);
+    void read_operands(NODE* t, bool is_certain);
+    void read_place(NODE* t, bool is_certain);
+    KNOWN number(const NODE* t);
+    KNOWN find(const NODE* t);
+    KNOWN number_of_leaf(const NODE* t);
+    int number_of_key(const TREE_KEY& key) {
+        return numbers.try_emplace(key, static_cast<int>(numbers.size()) + 1).first->second;
+    }
+    TRIPLE& triple_of(int number, const NODE* t, double cost);
+
+    std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> numbers; // looked up, never walked
+    std::unordered_map<int, size_t> triples;                  // by number
+    std::unordered_map<const NODE*, KNOWN> known;             // of the trees of one statement
+    BBLK* block = nullptr;
+    LIST* cell = nullptr;
+    int position = 0;
+};
+
+void ANNOTATOR::enter_writes(const BBLK* bb, const NODE* t, int at) {
+    const TRIPLE_WRITE here{bb->dfn, at, t};
+    bool writes_memory = false;
+    for_each_write(t, [&](const WRITE& w) {
+        const NODE* name = w.place ? name_of_place(w.place) : nullptr;
+        if (!name || !only_its_name_reaches(name->u.sym)) {
+            writes_memory = true;
+            return;
+        }
+        variable_writes[name->u.sym].push_back(here);
+    });
+    const bool acts = writes_memory || tree_has_side_effects(t);
+    if (writes_memory) memory_writes.push_back(here);
+    if (acts && any_subtree(t, [](const NODE* n) {
+            return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM ||
+                   ((n->op == NAME || n->op == UMULT || n->op == STDOT || n->op == STREF) && lvalue_is_volatile(n));
+        }))
+        staying.push_back(here);
+}
+
+ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {
+    KNOWN k;
+    const unsigned code = type_code(t->type);
+    if (t->op == NAME && t->u.sym && !t->u.sym->is_function())
+        k.number = number_of_key({NAME, code, identity(t->u.sym), 0, 0});
+    else if (t->op == ICON && code)
+        k.number = number_of_key({ICON, code, t->u.lval.value, t->u.lval.sign, 0});
+    return k;
+}
+
+ANNOTATOR::KNOWN ANNOTATOR::number(const NODE* t) {
+    auto at = known.find(t);
+    return at != known.end() ? at->second : known[t] = find(t);
+}
+
+ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
+    if (number_of_operands[t->op] == 0 || t->op == NAME) return number_of_leaf(t);
+    const bool is_member = t->op == STDOT || t->op == STREF;
+    const bool is_load = t->op == UMULT || is_member;
+    if ((!op_is_computed(t->op) && !is_load && t->op != UAND && t->op != ISP2CHAR) ||
+        (is_load && lvalue_is_volatile(t)))
+        return {};
+    if (is_member && (!t->right->mval || t->right->mval->is_bitfld)) return {};
+    const unsigned code = type_code(t->type);
+    if (!code && !is_load) return {};
+    const KNOWN a = number(t->left), b = t->right && !is_member ? number(t->right) : KNOWN();
+    if (a.number == NO_TRIPLE || (t->right && !is_member && b.number == NO_TRIPLE)) return {};
+    KNOWN k;
+    k.nodes = a.nodes + b.nodes + 1;
+    if (k.nodes > MOST_NODES) return {};
+    k.cost = a.cost + b.cost + (t->op == UMULT ? 1.5 : weight_of_operator(t));
+    const uint64_t payload = is_member ? t->right->mval->offset : is_load ? t->type->size : type_code(t->left->type);
+    int x = a.number, y = b.number;
+    if (t->right && !is_member && commute_inv[t->op] == t->op && y < x) std::swap(x, y);
+    k.number = number_of_key({t->op, code, payload, x, y});
+    return k;
+}
+
+TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
+    auto [at, is_new] = triples.try_emplace(number, unique_triples.size());
+    if (!is_new) return unique_triples[at->second];
+    TRIPLE t;
+    t.tree = const_cast<NODE*>(tree);
+    t.cost = cost;
+    for_each_subtree(tree, [&t](const NODE* n) {
+        if (n->op == DIV || n->op == MOD) t.may_trap = true;
+        if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
+        if (n->op != NAME || !n->u.sym) return;
+        if (!only_its_name_reaches(n->u.sym)) // an address of it costs nothing to ask about
+            t.reads_memory = true;
+        else if (std::find(t.variables.begin(), t.variables.end(), n->u.sym) == t.variables.end())
+            t.variables.push_back(n->u.sym);
+    });
+    unique_triples.push_back(std::move(t));
+    return unique_triples.back();
+}
+
+void ANNOTATOR::read(NODE*& slot, bool is_certain) {
+    NODE* t = slot;
+    if (!t || number_of_operands[t->op] == 0) return;
+    if (good_CSE_tree(t, false) && type_code(t->type)) {
+        const KNOWN k = number(t);
+        if (k.number != NO_TRIPLE && k.cost > 0)
+            triple_of(k.number, t, k.cost).sites.push_back({block->dfn, position, &slot, block, cell, is_certain});
+    }
+    read_operands(t, is_certain);
+}
+
+void ANNOTATOR::read_operands(NODE* t, bool is_certain) {
+    switch (t->op) {
+    case UAND:
+    case ARGREF:
+    case STARG:
+    case STDOT: return read_place(t->left, is_certain);
+    case STREF: return read(t->left, is_certain);
+    case ANDAND:
+    case OROR:
+    case QUEST: read(t->left, is_certain); return read(t->right, false);
+    default: read(t->left, is_certain); read(t->right, is_certain);
+    }
+}
+
+void ANNOTATOR::read_place(NODE* t, bool is_certain) {
+    NODE* object = without_members(t);
+    if (object->op == UMULT || object->op == STREF) read(object->left, is_certain);
+}
+
+void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
+    block = bb;
+    cell = s;
+    position = at;
+    known.clear();
+    NODE* t = s->first;
+    enter_writes(bb, t, at);
+    if (!reads_come_first(t)) return;
+    switch (t->op) {
+    case RETURN: return read(t->right, true);
+    case IF: // its own compare stays what the control flow is read from
+    case SWITCH: return read_operands(t->left, true);
+    case CALL: return read_operands(t, true);
+    default:
+        if (t->right->op == CALL || t->op == STASG)
+            read_operands(t->right, true);
+        else
+            read(t->right, true);
+        read_place(t->left, true);
+    }
+}
+
+} // namespace
+
+const std::vector<TRIPLE_WRITE>& writes_of_variable(const SYMTAB* sym) {
+    static const std::vector<TRIPLE_WRITE> none;
+    auto at = variable_writes.find(sym);
+    return at == variable_writes.end() ? none : at->second;
+}
+const std::vector<TRIPLE_WRITE>& writes_of_memory() { return memory_writes; }
+const std::vector<TRIPLE_WRITE>& statements_that_may_stay() { return staying; }
+
+void annotate_cfg() {
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'annotate_cfg' ----------\n");
+    clean_up_gdflow_bitvecs();
+    need(fact::alias | fact::block_numbers);
+    ANNOTATOR().run();
+}
+
+void clean_up_gdflow_bitvecs() {
+    std::vector<TRIPLE>().swap(unique_triples);
+    variable_writes.clear();
+    std::vector<TRIPLE_WRITE>().swap(memory_writes);
+    std::vector<TRIPLE_WRITE>().swap(staying);
+}
+
 void clean_up_assert_RELOPs() {}

@@ -1,19 +1,19 @@
 // Common subexpressions of a block, and of the chain of blocks that each lead to one that is entered from nowhere else.
 //
 // Values are numbered: two trees have one number where they surely give the same value (Alpern, Wegman and Zadeck,
-// Detecting Equality of Variables in Programs, 1988; here over a chain of blocks, which needs no fixpoint). A tree whose
-// number a variable has is replaced by that variable. Otherwise its occurrences are remembered, and once they would save
-// more than an assignment costs, the first of them is kept in a temporary ahead of its statement. A store gives the place
-// the number of what is stored, so that a load behind it finds that; so does a compound
-// assignment. What is assigned to a variable that has its number already is dropped. A remainder is computed from the
-// quotient of its operands where that is known.
+// Detecting Equality of Variables in Programs, 1988; here over a chain of blocks, which needs no fixpoint). A tree
+// whose number a variable has is replaced by that variable. Otherwise its occurrences are remembered, and once they
+// would save more than an assignment costs, the first of them is kept in a temporary ahead of its statement. A store
+// gives the place the number of what is stored, so that a load behind it finds that; so does a compound assignment.
+// What is assigned to a variable that has its number already is dropped. A remainder is computed from the quotient of
+// its operands where that is known.
 //
 // Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph; symbols are split anew.
 // Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
 // forgotten where the place or its address may change. Trees without effects alone are numbered, in statements that
-// evaluate all of them ahead of their one effect: of `*p + f()` the load may come first or last. The first occurrence is
-// evaluated whenever its statement is, so that nothing is computed that was not. A chain ends where an exception may leave
-// a statement in its middle.
+// evaluate all of them ahead of their one effect: of `*p + f()` the load may come first or last. The first occurrence
+// is evaluated whenever its statement is, so that nothing is computed that was not. A chain ends where an exception may
+// leave a statement in its middle.
 #include "OPT5/scalar/lcse.h"
 
 #include "OPT5/alias/alias.h"
@@ -26,9 +26,8 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/subrange.h"
+#include "OPT5/scalar/triples.h"
 #include "OPT5/simp/seq.h"
-
-#include <boost/container_hash/hash.hpp>
 
 #include <algorithm>
 #include <cmath>
@@ -49,7 +48,7 @@ bool good_CSE_tree(const NODE* t, bool) {
         return !(t->type->is_pointer() && t->right->op == ICON);
     case UAND:
     case ARGREF: return false; // a constant, or the sum below it
-    case SCONV: // a product of two of them is the short one, which one of variables would not be
+    case SCONV:                // a product of two of them is the short one, which one of variables would not be
     case PCONV:
     case ISP2CHAR: return false;
     default: return true;
@@ -60,53 +59,8 @@ namespace {
 
 using VALUE = int; // a value's number; 0: none
 constexpr size_t MOST_LOADS = 32, MOST_HOLDERS = 4;
-constexpr int MOST_NODES = 64;               // of a tree that is worth looking for
-constexpr int COST_OF_DIVISION = 16;
+constexpr int MOST_NODES = 64; // of a tree that is worth looking for
 constexpr double COST_OF_ASSIGNMENT = 1;
-
-// Types that one representation serves: all pointers, integers by width and sign. 0: no such type.
-unsigned code_of(const TYPE* t) {
-    if (t->is_pointer()) return 1;
-    if (t->is_float() && !t->is_complex()) return 2 | t->size << 4;
-    if ((t->is_int() || t->is_enum()) && !t->is_bool()) return (t->is_unsigned() ? 3u : 4u) | t->size << 4;
-    return 0;
-}
-
-struct KEY {
-    int op;
-    unsigned code;
-    uint64_t payload;
-    VALUE a, b;
-    bool operator==(const KEY& o) const {
-        return op == o.op && code == o.code && payload == o.payload && a == o.a && b == o.b;
-    }
-};
-struct KEY_HASH {
-    size_t operator()(const KEY& k) const {
-        size_t h = 0;
-        boost::hash_combine(h, k.op);
-        boost::hash_combine(h, k.code);
-        boost::hash_combine(h, k.payload);
-        boost::hash_combine(h, k.a);
-        boost::hash_combine(h, k.b);
-        return h;
-    }
-};
-uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); } // compared alone
-
-bool is_computed(int op) {
-    if (op == EXCLAIM || op == SCONV || op == PCONV || op == PMCONV) return true;
-    return op_is_arithmetic(op) || op_is_int_compare(op) || op_is_float_compare(op);
-}
-
-bool is_free(int op) { return op == SCONV || op == PCONV || op == ISP2CHAR || op == COMMA; }
-
-// What an operator costs beside its operands, a load included.
-int weight_of(const NODE* t) {
-    if (is_free(t->op) || number_of_operands[t->op] == 0) return 0;
-    if (t->op == DIV || t->op == MOD) return COST_OF_DIVISION;
-    return t->op == UMULT || t->op == STREF ? 2 : 1;
-}
 
 bool is_assignment_of_private_name(const NODE* t) {
     return (t->op == ASG || is_operator_assignment(t)) && is_private_name(t->left) && !tree_has_side_effects(t->right);
@@ -116,7 +70,7 @@ bool is_assignment_of_private_name(const NODE* t) {
 
 // A load whose place has not changed since.
 struct LOAD {
-    KEY key;
+    TREE_KEY key;
     NODE* lvalue; // a copy
     VALUE value;
     uint64_t names; // those that it mentions, by `mark_of`
@@ -159,13 +113,13 @@ public:
 
     // Of the quotient that belongs to a remainder.
     VALUE of_quotient(const NODE* remainder) {
-        return computed_as({DIV, code_of(remainder->type), code_of(remainder->left->type), of(remainder->left),
+        return computed_as({DIV, type_code(remainder->type), type_code(remainder->left->type), of(remainder->left),
                             of(remainder->right)});
     }
 
     void stored(const NODE* lvalue, VALUE v) {
         begin_statement(); // the place may hold temporaries now
-        const KEY key = key_of_load(lvalue);
+        const TREE_KEY key = key_of_load(lvalue);
         if (key.code) enter_load(key, lvalue, v);
     }
     // What evaluating `t` changes has no known value any more.
@@ -193,13 +147,13 @@ private:
     VALUE of_load(const NODE* t);
     VALUE of_operator(const NODE* t);
     VALUE of_address(const NODE* place);
-    KEY key_of_load(const NODE* t);
+    TREE_KEY key_of_load(const NODE* t);
 
-    VALUE computed_as(const KEY& key) {
+    VALUE computed_as(const TREE_KEY& key) {
         VALUE& v = computed[key];
         return v ? v : v = fresh();
     }
-    void enter_load(const KEY& key, const NODE* lvalue, VALUE v) {
+    void enter_load(const TREE_KEY& key, const NODE* lvalue, VALUE v) {
         if (count_nodes_in_tree(lvalue) > MOST_NODES) return;
         if (loads.size() == MOST_LOADS) {
             erase_tree(loads.front().lvalue);
@@ -213,7 +167,7 @@ private:
     }
 
     VALUE last = 0;
-    std::unordered_map<KEY, VALUE, KEY_HASH> computed; // looked up, never walked
+    std::unordered_map<TREE_KEY, VALUE, TREE_KEY_HASH> computed; // looked up, never walked
     std::unordered_map<const SYMTAB*, VALUE> variables;
     std::vector<LOAD> loads;
     std::unordered_map<const NODE*, KNOWN> known; // of the trees of one statement
@@ -227,7 +181,7 @@ VALUE NUMBERS::of(const NODE* t) {
 int NUMBERS::cost_of(const NODE* t) {
     int& cost = known[t].cost;
     if (cost < 0) {
-        int sum = weight_of(t);
+        int sum = weight_of_operator(t);
         if (t->left) sum += cost_of(t->left);
         if (t->right) sum += cost_of(t->right);
         cost = std::min(sum, 1 << 20);
@@ -238,26 +192,26 @@ int NUMBERS::cost_of(const NODE* t) {
 VALUE NUMBERS::find(const NODE* t) {
     switch (t->op) {
     case NAME: return of_name(t);
-    case ICON: return code_of(t->type) ? computed_as({ICON, code_of(t->type), t->u.lval.value, 0, 0}) : fresh();
+    case ICON: return type_code(t->type) ? computed_as({ICON, type_code(t->type), t->u.lval.value, 0, 0}) : fresh();
     case FCON: return fresh();
     case UAND: return of_address(t->left);
     case UMULT:
     case STDOT:
     case STREF: return of_load(t);
     case ISP2CHAR: return t->left->type->is_pointer() && t->type->is_pointer() ? of(t->left) : fresh();
-    default: return is_computed(t->op) ? of_operator(t) : fresh();
+    default: return op_is_computed(t->op) ? of_operator(t) : fresh();
     }
 }
 
 VALUE NUMBERS::of_name(const NODE* t) {
     const SYMTAB* sym = t->u.sym;
-    const unsigned code = code_of(t->type);
-    if (!sym || !code || code != code_of(sym->type)) return fresh();
+    const unsigned code = type_code(t->type);
+    if (!sym || !code || code != type_code(sym->type)) return fresh();
     return is_private_name(t) ? of_variable(sym) : of_load(t);
 }
 
 VALUE NUMBERS::of_operator(const NODE* t) {
-    const unsigned code = code_of(t->type), from = code_of(t->left->type);
+    const unsigned code = type_code(t->type), from = type_code(t->left->type);
     if (!code || !from || (from == 1 && t->op == MINUS && code != 1)) return fresh(); // a difference counts elements
     VALUE a = of(t->left), b = t->right ? of(t->right) : 0;
     if (t->op == PCONV && code == from) return a; // between pointers
@@ -275,9 +229,9 @@ VALUE NUMBERS::of_address(const NODE* place) {
 }
 
 // The key has no code where a tree is no load of a plain scalar.
-KEY NUMBERS::key_of_load(const NODE* t) {
-    const KEY none{t->op, 0, 0, 0, 0};
-    const unsigned code = code_of(t->type);
+TREE_KEY NUMBERS::key_of_load(const NODE* t) {
+    const TREE_KEY none{t->op, 0, 0, 0, 0};
+    const unsigned code = type_code(t->type);
     if (!code || lvalue_is_volatile(t)) return none;
     if ((t->op == STDOT || t->op == STREF) && t->right->mval->is_bitfld) return none;
     int64_t offset = 0;
@@ -292,7 +246,7 @@ KEY NUMBERS::key_of_load(const NODE* t) {
 }
 
 VALUE NUMBERS::of_load(const NODE* t) {
-    const KEY key = key_of_load(t);
+    const TREE_KEY key = key_of_load(t);
     if (!key.code) return fresh();
     for (const LOAD& l : loads)
         if (l.key == key) return l.value;
@@ -303,8 +257,8 @@ VALUE NUMBERS::of_load(const NODE* t) {
 
 VALUE NUMBERS::of_step(const NODE* asg, VALUE a, VALUE b) {
     const int op = op_of_opASG[asg->op];
-    const unsigned code = code_of(asg->left->type), by = code_of(asg->right->type);
-    const bool is_plain = is_computed(op) && code && (code == by || (code == 1 && asg->right->type->is_int()));
+    const unsigned code = type_code(asg->left->type), by = type_code(asg->right->type);
+    const bool is_plain = op_is_computed(op) && code && (code == by || (code == 1 && asg->right->type->is_int()));
     if (!is_plain) return fresh();
     if (commute_inv[op] == op && b < a) std::swap(a, b);
     return computed_as({op, code, code == 1 ? 0 : code, a, b});
@@ -315,19 +269,13 @@ VALUE NUMBERS::of_step(const NODE* asg, VALUE a, VALUE b) {
 // What is known of a value: which variables have it, or where it was computed first and is computed again.
 struct OCCURRENCES {
     std::vector<SYMTAB*> holders;
-    NODE** first = nullptr; // null: nowhere that it can be kept from
-    LIST* cell = nullptr;   // the statement of that
-    bool is_step = false;   // it is what a compound assignment, the whole statement, stores
-    int order = 0;          // behind that of all of its operands
-    size_t block = 0;       // the place in the chain
+    NODE** first = nullptr;            // null: nowhere that it can be kept from
+    LIST* cell = nullptr;              // the statement of that
+    bool is_step = false;              // it is what a compound assignment, the whole statement, stores
+    int order = 0;                     // behind that of all of its operands
+    size_t block = 0;                  // the place in the chain
     double gain = -COST_OF_ASSIGNMENT; // of keeping it
     std::vector<NODE**> later;
-};
-
-// A temporary's assignment that is to stand ahead of a statement.
-struct KEPT {
-    int order;
-    NODE* assignment;
 };
 
 class COMMON_SUBEXPRESSIONS {
@@ -345,7 +293,6 @@ public:
 private:
     void block(BBLK* bb);
     void end_chain();
-    bool reads_come_first(const NODE* t) const;
     void statement(LIST* s);
     void assignment(LIST* s);
     bool is_redundant(const NODE* t);
@@ -361,7 +308,7 @@ private:
 
     NUMBERS numbers;
     std::unordered_map<VALUE, OCCURRENCES> values; // looked up, never walked
-    std::unordered_map<const LIST*, std::vector<KEPT>> ahead;
+    STATEMENTS_AHEAD ahead;
     std::vector<BBLK*> blocks; // of the chain
     const BBLK* chain_end = nullptr;
     LIST* current = nullptr;
@@ -382,48 +329,14 @@ void COMMON_SUBEXPRESSIONS::block(BBLK* bb) {
     if (any_dropped) drop_empty_cells(&bb->statements);
 }
 
-// The assignments to temporaries take their places: in order, and ahead of the pragmas that speak of what follows.
 void COMMON_SUBEXPRESSIONS::end_chain() {
-    for (BBLK* bb : blocks) {
-        if (ahead.empty()) break;
-        LIST** pragmas = nullptr;
-        for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
-            auto it = ahead.find(*link);
-            if (it != ahead.end()) {
-                LIST** at = pragmas ? pragmas : link;
-                LIST* statement = *link;
-                std::sort(it->second.begin(), it->second.end(),
-                          [](const KEPT& a, const KEPT& b) { return a.order < b.order; });
-                for (const KEPT& kept : it->second) at = &(*insert_before(at, kept.assignment, statement->psn));
-                while (*link != statement) link = &(*link)->rest;
-            }
-            if ((*link)->first->op != PPRAGMA)
-                pragmas = nullptr;
-            else if (!pragmas)
-                pragmas = link;
-        }
-    }
+    if (!ahead.empty())
+        for (BBLK* bb : blocks) insert_statements_ahead(bb, ahead);
     ahead.clear();
     blocks.clear();
     values.clear();
     numbers.restart();
     chain_end = nullptr;
-}
-
-// All of its operands are evaluated ahead of the one effect of the statement.
-bool COMMON_SUBEXPRESSIONS::reads_come_first(const NODE* t) const {
-    auto acts = [](const NODE* n) { return n && tree_has_side_effects(n); };
-    switch (t->op) {
-    case RETURN: return !acts(t->right);
-    case IF:
-    case SWITCH: return t->left->op != ENDLOOP && !acts(t->left);
-    case CALL: return !acts(t->left) && !acts(t->right);
-    case ASG:
-        if (tree_is_arg_prolog(t) || acts(t->left)) return false;
-        return t->right->op == CALL ? reads_come_first(t->right) : !acts(t->right);
-    case STASG: return !tree_is_arg_prolog(t) && !acts(t->left) && !acts(t->right);
-    default: return is_operator_assignment(t) && t->right && !acts(t->left) && !acts(t->right);
-    }
 }
 
 void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
@@ -450,7 +363,7 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
     return t->op == ASG && is_private_name(t->left) && t->right->op != CALL &&
-           code_of(t->left->type) == code_of(t->right->type) && code_of(t->left->type) &&
+           type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->type) &&
            numbers.of(t->right) == numbers.of(t->left);
 }
 
@@ -476,7 +389,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     }
     read_place(t->left, true);
     numbers.forget_changed(t);
-    if (v && code_of(t->left->type) == code_of(is_plain ? t->right->type : t->left->type)) learn_store(t, v);
+    if (v && type_code(t->left->type) == type_code(is_plain ? t->right->type : t->left->type)) learn_store(t, v);
 }
 
 // Whether `x op= e` is `x = x op e` in the type of x.
@@ -489,7 +402,7 @@ bool holds_step(const NODE* t) {
 void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
     const NODE* to = t->left;
     if (is_private_name(to)) {
-        if (code_of(to->type) != code_of(to->u.sym->type)) return;
+        if (type_code(to->type) != type_code(to->u.sym->type)) return;
         numbers.assign(to->u.sym, v);
         if (to->u.sym->type->qual_kind(false) & QUAL_RESTRICT) return; // what it points to would count as reached by it
         std::vector<SYMTAB*>& holders = values[v].holders;
@@ -530,9 +443,7 @@ void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
         read(t->right, false);
         return;
     case STREF: read(t->left, is_certain); return;
-    default:
-        read(t->left, is_certain);
-        read(t->right, is_certain);
+    default: read(t->left, is_certain); read(t->right, is_certain);
     }
 }
 
@@ -544,12 +455,12 @@ void COMMON_SUBEXPRESSIONS::read_place(NODE* t, bool is_certain) {
 
 SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {
     for (auto it = known.holders.rbegin(); it != known.holders.rend(); ++it)
-        if (numbers.of_variable(*it) == v && code_of((*it)->type) == code_of(type)) return *it;
+        if (numbers.of_variable(*it) == v && type_code((*it)->type) == type_code(type)) return *it;
     return nullptr;
 }
 
 bool COMMON_SUBEXPRESSIONS::has_quotient(const NODE* t) {
-    if (t->op != MOD || !code_of(t->type) || !code_of(t->left->type)) return false;
+    if (t->op != MOD || !type_code(t->type) || !type_code(t->left->type)) return false;
     const VALUE v = numbers.of_quotient(t);
     const OCCURRENCES& known = values[v];
     return known.first || holder_of(known, v, t->type);
@@ -572,8 +483,8 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
         numbers.begin_statement();
     }
     NODE* t = slot;
-    if (!good_CSE_tree(t, false) || !code_of(t->type)) return false;
-    if (!is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF) return false;
+    if (!good_CSE_tree(t, false) || !type_code(t->type)) return false;
+    if (!op_is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF) return false;
     const VALUE v = numbers.of(t);
     OCCURRENCES& known = values[v];
     if (SYMTAB* holder = holder_of(known, v, t->type)) {

@@ -1,0 +1,83 @@
+// Expressions by number: what passes on common subexpressions of a block and of a function share.
+#pragma once
+
+#include "OPT5/ir/list.h"
+#include "OPT5/ir/node.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <unordered_map>
+#include <vector>
+
+class BBLK;
+class SYMTAB;
+
+// ---- What makes two trees the same computation
+
+// Types that one representation serves: all pointers, integers by width and sign, floating-point numbers by width. 0:
+// no such type.
+unsigned type_code(const TYPE* t);
+
+// An operator, its types, and its operands by number.
+struct TREE_KEY {
+    int op;
+    unsigned code;    // of its type
+    uint64_t payload; // a symbol, a constant, an offset, or the code of the operands' type; compared alone
+    int a, b;         // the operands
+    bool operator==(const TREE_KEY& o) const {
+        return op == o.op && code == o.code && payload == o.payload && a == o.a && b == o.b;
+    }
+};
+struct TREE_KEY_HASH {
+    size_t operator()(const TREE_KEY& k) const;
+};
+inline uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); }
+
+bool op_is_computed(int op); // an operator on values whose result they decide
+// What an operator costs beside its operands, a load included; casts, leaves and addresses are free.
+int weight_of_operator(const NODE* t);
+// All operands of the statement are evaluated ahead of its one effect, if it has one.
+bool reads_come_first(const NODE* statement);
+
+// Assignments to temporaries that are to stand ahead of statements: by the statement, in ascending order.
+struct KEPT {
+    int order;
+    NODE* assignment;
+};
+using STATEMENTS_AHEAD = std::unordered_map<const LIST*, std::vector<KEPT>>; // looked up, never walked
+void insert_statements_ahead(BBLK* bb, STATEMENTS_AHEAD& ahead); // ahead also of the pragmas that speak of what follows
+
+// ---- The expressions of the current function
+
+// Where an expression is computed.
+struct TRIPLE_SITE {
+    int block;    // number
+    int position; // of the statement in it; what a statement reads comes ahead of what it writes
+    NODE** slot;
+    BBLK* bb;
+    LIST* cell;
+    bool is_certain; // whenever the statement is evaluated
+};
+
+struct TRIPLE {
+    NODE* tree = nullptr; // its first occurrence, borrowed
+    double cost = 0;
+    bool may_trap = false; // a division, or a load through a pointer
+    bool reads_memory = false;
+    std::vector<const SYMTAB*> variables; // private ones that it reads
+    std::vector<TRIPLE_SITE> sites;       // in the order of blocks and statements
+};
+
+// A place where something is written.
+struct TRIPLE_WRITE {
+    int block;
+    int position;
+    const NODE* statement;
+};
+
+extern std::vector<TRIPLE> unique_triples;
+// The writes of a private variable, and those of everything else, in order.
+const std::vector<TRIPLE_WRITE>& writes_of_variable(const SYMTAB* sym);
+const std::vector<TRIPLE_WRITE>& writes_of_memory();
+// Statements that may not pass control on: what may trap does not move ahead of them.
+const std::vector<TRIPLE_WRITE>& statements_that_may_stay();

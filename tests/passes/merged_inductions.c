@@ -65,7 +65,7 @@ void smooth(int n) {
 
 // By an amount that stays, and through a variable that each round sets anew; not by the value of the round before.
 // FUNCTION: butterfly
-// COUNT 4: += $O$P
+// COUNT 4: /P[0-9] \+= \$O\$/
 // COUNT 0: k =
 void butterfly(int half) {
     for (int i = 0; i < 32; i += half * 2) {
@@ -229,7 +229,7 @@ long nests(int n, int k) {
 // An address that stays is computed ahead of the loop; the load is not, for the loop stores to what it reads.
 // FUNCTION: settled
 // COUNT 1: PMCONV((long)k
-// HAS: s += *$O$P0 * *$O$P1
+// HAS: /^s \+= \*\(\$O\$U0 \+ 6\) \* \*\$O\$P1$/
 void settled(int k, int n, long s) {
     for (int i = 0; i < n; i++) {
         s += m[k][3] * w[i];

@@ -1,0 +1,125 @@
+// Computations that are redundant on some path go, and nothing is computed that was not.
+// RUN: --opt_level=2 --disable_inlining --debug:validate
+#include <stdlib.h>
+#include <string.h>
+#include <zrun.h>
+
+void use(int x);
+int check(int b);
+int hits;
+void use(int x) { hits += x; }
+int check(int b) { if (b == 0) { put_i16(-1); exit(0); } return b; }
+
+#define E(a, b) (((a) ^ (b) * 3) * ((a) + (b) * 5))
+
+// In both arms and behind them: no third time.
+// FUNCTION: both_arms
+// COUNT 2: b * 5 + a
+int both_arms(int a, int b, int c) {
+    int x;
+    if (c > 0) x = E(a, b); else { use(E(a, b) + 1); x = 1; }
+    use(c);
+    return x + E(a, b);
+}
+
+// In one arm and behind it: the other arm computes it, too.
+// FUNCTION: one_arm
+// COUNT 2: b * 5 + a
+int one_arm(int a, int b, int c) {
+    if (c > 0) use(E(a, b)); else use(c);
+    return E(a, b);
+}
+
+// Not where one path does not need it.
+int not_on_the_other_path(int a, int b, int c, int d) {
+    if (c > 0) use(E(a, b)); else use(c);
+    if (d > 0) return c;
+    return E(a, b);
+}
+
+// An operand changes in between, also within one statement.
+int changed(int a, int b, int c) {
+    int x = (a + b) * c, y, z;
+    if (c > 3) use(x);
+    a++;
+    y = (a + b) * c;
+    if (c > 4) use(y);
+    z = (a + b) * c + a++;
+    if (c > 5) use(a);
+    return x ^ y ^ z ^ (a + b) * c;
+}
+
+// A division stays behind a call that may not return; 1: it is not computed ahead of the loop.
+// FUNCTION: divides
+// COUNT 1: n / b
+int divides(int n, int b) {
+    int i, s = 0;
+    for (i = 0; i < n; i++) { check(b); s += n / b; }
+    return s;
+}
+
+// A shift or a compare of another sign is another computation.
+int signs(int a, unsigned u, int c) {
+    int x = a >> 1, y;
+    if (c) use((unsigned)a >> 1 > 9u);
+    y = (unsigned)a >> 1 > 100u;
+    if (c > 2) use(a < 7);
+    return x + y + ((unsigned)a < 7u) + (int)(u >> 1) + (a >> 1);
+}
+
+struct S { int a, b[3]; } gs;
+int cell, *volatile pc = &cell;
+// Stores of structures, copies of memory, calls and unknown pointers change what is read.
+int changes_of_memory(struct S *s, struct S *t, int *p, int c) {
+    int x = s->b[1] * 3, y, z, w;
+    if (c) use(x);
+    *s = *t;
+    y = s->b[1] * 3;
+    if (c) use(y);
+    memcpy(s, &gs, sizeof gs);
+    z = s->b[1] * 3;
+    *p = 4;
+    w = s->b[1] * 3;
+    if (c > 1) use(w);
+    *pc = 77;
+    return x + y * 2 + z * 4 + w * 8 + s->b[1] * 3 + cell;
+}
+
+// FUNCTION: around_a_loop
+// COUNT 1: a * b * 5
+int around_a_loop(int a, int b, int n) {
+    int i = 0, s = 0;
+    do { s ^= a * b * 5 + i; use(s); i++; } while (i < n);
+    return s;
+}
+
+// Edges of a switch that lead to one place.
+int critical_edges(int a, int b, int c) {
+    int x = 0;
+    switch (c) {
+    case 1: x = a * b * 7; break;
+    case 2: use(a * b * 7);
+    case 3:
+    case 4: x += a * b * 7; break;
+    case 5: break;
+    default: use(3);
+    }
+    return c > 2 ? x + a * b * 7 : x;
+}
+
+
+int main(void) {
+    struct S s = {1, {2, 3, 4}}, t = {5, {6, 7, 8}};
+    int c;
+    gs.b[1] = 11;
+    for (c = -1; c < 7; c++) {
+        put_i16(both_arms(c, 7, c - 2)); put_i16(one_arm(c, 3, c - 1)); put_i16(not_on_the_other_path(c, 9, c - 2, c & 1));
+        put_i16(changed(c, 8, c)); put_i16(signs(c - 3, 7u + c, c)); put_i16(around_a_loop(c, 3, 4));
+        put_i16(critical_edges(c, 6, c));
+        put_i16(changes_of_memory(&s, &t, &s.b[1], c));
+        s.b[1] = c;
+    }
+    put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
+    put_i16(divides(4, 0));
+    return 0;
+}

@@ -37,6 +37,17 @@ MOTION_GRAPH::MOTION_GRAPH(bool backward) : is_backward(backward) {
         order.push_back(b);
     }
     if (backward) std::reverse(order.begin(), order.end());
+    is_closed.assign(count, false);
+    for (size_t b : order)
+        for (size_t p : before[b]) {
+            BBLK *from = backward ? blocks[b] : blocks[p], *to = backward ? blocks[p] : blocks[b];
+            if (!EDGE_STATEMENTS::may_insert(from, to)) is_closed[b] = true;
+        }
+}
+
+MOTION::MOTION(const MOTION_GRAPH& graph) : sets(graph.blocks.size()), graph(graph) {
+    for (size_t b : graph.order)
+        if (graph.is_closed[b]) sets[b].closed = ALL;
 }
 
 INSERTIONS MOTION::no_insertions() const {

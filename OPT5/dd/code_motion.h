@@ -26,6 +26,7 @@ struct MOTION_GRAPH {
     explicit MOTION_GRAPH(bool backward);
 
     const bool is_backward;
+    std::vector<bool> is_closed; // by block: no statement can be put on some edge to its start
     std::vector<BBLK*> blocks; // [0] is null
     std::vector<std::vector<size_t>> before, after;
     std::vector<size_t> order;
@@ -46,8 +47,8 @@ using INSERTIONS = std::vector<std::vector<CANDIDATES>>;
 
 class MOTION {
 public:
-    explicit MOTION(const MOTION_GRAPH& graph) : sets(graph.blocks.size()), graph(graph) {}
-    std::vector<MOTION_SETS> sets; // by block; filled by the caller
+    explicit MOTION(const MOTION_GRAPH& graph);
+    std::vector<MOTION_SETS> sets; // by block; filled by the caller, but for what the graph closes
 
     // An occurrence is certain to follow each start of a block, before anything is in its way.
     std::vector<CANDIDATES> anticipated() const;

@@ -32,15 +32,17 @@
 
 PROMOTION_CANDIDATE::~PROMOTION_CANDIDATE() { erase_tree(reference); }
 
-SYMTAB* PROMOTION_TEMPS::of(const PROMOTION_CANDIDATE& c) {
+SYMTAB* PROMOTION_TEMPS::of(PROMOTION_CANDIDATE& c) {
+    if (c.temp) return c.temp;
     const SSAVAR* v = c.variable;
-    for (const ENTRY& e : entries)
-        if (e.base == v->base() && e.is_indirect == (v->pointer != nullptr) && e.start == v->start &&
-            e.length == v->length && equiv_mtypes(e.temp->type, c.reference->type))
-            return e.temp;
-    SYMTAB* temp = sym_temp('v', -1, c.reference->type->stqs(), nullptr);
-    entries.push_back({v->base(), v->pointer != nullptr, v->start, v->length, temp});
-    return temp;
+    std::vector<ENTRY>& at = entries[v->base()];
+    for (const ENTRY& e : at)
+        if (e.is_indirect == (v->pointer != nullptr) && e.start == v->start && e.length == v->length &&
+            equiv_mtypes(e.temp->type, c.reference->type))
+            return c.temp = e.temp;
+    c.temp = sym_temp('v', -1, c.reference->type->stqs(), nullptr);
+    at.push_back({v->pointer != nullptr, v->start, v->length, c.temp});
+    return c.temp;
 }
 
 static bool is_access(int op) { return op == NAME || op == UMULT || op == STDOT || op == STREF; }
@@ -115,9 +117,9 @@ void COLLECTOR::collect(const BBLK* bb) {
         if ((t->op == NASSERT || t->op == ASSERT) && !with_assertions) continue;
         is_left_in_middle = cell->rest && tree_is_EH_SWITCH(cell->rest->first);
         walk(&cell->first, t->op == NASSERT || t->op == ASSERT);
-        if (first_stop[block] == INT32_MAX && may_leave_in_the_middle(t)) first_stop[block] = order;
+        if (first_stop[block] == INT32_MAX && may_leave_in_the_middle(below_SSA(t))) first_stop[block] = order;
         if (behind.empty()) continue;
-        for_each_written_name(t, [this](const NODE* name, const NODE*) {
+        for_each_written_name(below_SSA(t), [this](const NODE* name, const NODE*) {
             auto at = behind.find(name->u.sym);
             if (at == behind.end()) return;
             for (CANDIDATE* c : at->second) push(c, EVENT::KILL);
@@ -188,6 +190,7 @@ public:
     bool finish();
 
 private:
+    void prepare_sets();
     void fill_sets(size_t k);
     void fill_block(size_t k, size_t begin, size_t end);
     void add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted, const std::vector<CANDIDATES>& known);
@@ -199,7 +202,7 @@ private:
     void rewrite_use(CANDIDATE& c, EVENT& e);
     void rewrite_step(CANDIDATE& c, EVENT& use, EVENT& def);
     void store_behind(CANDIDATE& c, EVENT& def, NODE* value);
-    void tell(const char* what, const CANDIDATE& c, const EVENT& e);
+    void tell(const char* what, CANDIDATE& c, const EVENT& e);
     NODE* load(CANDIDATE& c) {
         return mk_ASG(mk_NAME(temps.of(c)), copy_tree(c.reference));
     }
@@ -229,14 +232,16 @@ void LOAD_PROMOTER::fill_block(size_t k, size_t begin, size_t end) {
     const CANDIDATES bit = CANDIDATES(1) << k;
     const size_t b = c.events[begin].block;
     MOTION_SETS& s = motion->sets[b];
+    bool is_changed = false;
     for (size_t i = begin; i < end; ++i) {
         const EVENT& e = c.events[i];
         if (e.kind == EVENT::USE) {
             if (e.is_conditional) continue;
-            if (s.demands & bit && !(c.may_trap() && e.order > first_stop[b])) s.first |= bit;
+            if (!is_changed && !(c.may_trap() && e.order > first_stop[b])) s.first |= bit;
             s.last |= bit;
             continue;
         }
+        is_changed = true;
         s.demands &= ~bit;
         s.passes &= ~bit;
         if (e.kind == EVENT::DEF)
@@ -249,18 +254,21 @@ void LOAD_PROMOTER::fill_block(size_t k, size_t begin, size_t end) {
 void LOAD_PROMOTER::fill_sets(size_t k) {
     CANDIDATE& c = *batch[k];
     const CANDIDATES bit = CANDIDATES(1) << k;
-    for (size_t b : graph.order) {
-        MOTION_SETS& s = motion->sets[b];
-        s.passes |= bit;
-        s.demands |= bit;
-        s.first &= ~bit;
-        s.last &= ~bit;
-    }
     for_each_block(c, [&](size_t, size_t begin, size_t end) { fill_block(k, begin, end); });
     for (size_t header : c.cut) motion->sets[header].cut |= bit;
-    if (!c.may_trap()) return;
-    for (size_t b : graph.order)
-        if (first_stop[b] != INT32_MAX) motion->sets[b].demands &= ~bit;
+}
+
+// A load behind a pointer is not wanted ahead of what may not come to its end.
+void LOAD_PROMOTER::prepare_sets() {
+    motion = std::make_unique<MOTION>(graph);
+    CANDIDATES trapping = 0;
+    for (size_t k = 0; k < batch.size(); ++k)
+        if (batch[k]->may_trap()) trapping |= CANDIDATES(1) << k;
+    for (size_t b : graph.order) {
+        motion->sets[b].passes = ~CANDIDATES(0);
+        motion->sets[b].demands = first_stop[b] != INT32_MAX ? ~trapping : ~CANDIDATES(0);
+    }
+    for (size_t k = 0; k < batch.size(); ++k) fill_sets(k);
 }
 
 // Where a load ahead of the loop stands for one in each iteration; null: there is no such place, or something in the loop
@@ -318,12 +326,8 @@ void LOAD_PROMOTER::add_benign_loads(size_t k, const std::vector<CANDIDATES>& wa
 
 void LOAD_PROMOTER::run(const std::vector<CANDIDATE*>& candidates, bool is_global) {
     batch = candidates;
-    motion = std::make_unique<MOTION>(graph);
-    for (size_t k = 0; k < batch.size(); ++k) fill_sets(k);
+    prepare_sets();
     if (!is_global) return decide(motion->no_insertions(), std::vector<CANDIDATES>(graph.blocks.size(), 0));
-    for (size_t b : graph.order)
-        for (size_t p : graph.before[b])
-            if (!EDGE_STATEMENTS::may_insert(graph.blocks[p], graph.blocks[b])) motion->sets[b].closed = ~CANDIDATES(0);
     if (benign && !loops.inner_first().empty()) {
         const std::vector<CANDIDATES> wanted = motion->anticipated(), known = motion->available(motion->no_insertions());
         for (size_t k = 0; k < batch.size(); ++k)
@@ -402,7 +406,7 @@ void LOAD_PROMOTER::decide(const INSERTIONS& inserted, const std::vector<CANDIDA
 
 // ---- The trees
 
-void LOAD_PROMOTER::tell(const char* what, const CANDIDATE& c, const EVENT& e) {
+void LOAD_PROMOTER::tell(const char* what, CANDIDATE& c, const EVENT& e) {
     if (!print_debug) return;
     if (std::strcmp(what, "deleted") == 0)
         debug_printf("   %s SSA RP load deleted in BB%d:\t%s\t<==  %s\n", e.is_local ? "Local" : "Global",
@@ -578,20 +582,24 @@ bool promote_loads(const std::vector<std::unique_ptr<CANDIDATE>>& all, PROMOTION
     return promoter.finish();
 }
 
-bool sweep(PROMOTION_TEMPS& temps, bool with_assertions, bool with_stores) {
+enum SWEEP : uint8_t { DONE, LOADS_CHANGED, STORES_CHANGED };
+
+// Stores are looked at in the form that the loads have left alone, since they go by what is still read.
+SWEEP sweep(PROMOTION_TEMPS& temps, bool with_assertions, bool is_second) {
     construct_SSA_form(false, false, false);
-    if (!function_is_in_SSA_form) return false;
-    bool any = false;
+    if (!function_is_in_SSA_form) return DONE;
+    SWEEP result = DONE;
     {
         const std::vector<std::unique_ptr<CANDIDATE>> candidates = find_candidates();
-        if (!candidates.empty()) any = promote_loads(candidates, temps, with_assertions);
-        if (!candidates.empty() && with_stores) any |= promote_stores(candidates, temps);
+        if (!candidates.empty() && promote_loads(candidates, temps, with_assertions)) result = LOADS_CHANGED;
+        if (!candidates.empty() && (is_second || result == DONE) && promote_stores(candidates, temps))
+            result = STORES_CHANGED;
     }
     deconstruct_SSA_form();
-    if (!any) return false;
+    if (result == DONE) return DONE;
     sym_split(currfuninfo);
     changed(fact::graph | fact::alias_marks);
-    return true;
+    return result;
 }
 
 } // namespace
@@ -601,8 +609,8 @@ bool promote_vars_to_registers(bool with_assertions) {
     if (function_saves_environment() || TEST_FLAG(currfuninfo, FUN_is_interrupt)) return false;
     if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'promote_SSA_vars_to_registers' ------\n");
     PROMOTION_TEMPS temps;
-    bool any = sweep(temps, with_assertions, false);
-    any |= sweep(temps, with_assertions, true);
-    if (any) promote_all_embedded_assignments();
-    return any;
+    const SWEEP first = sweep(temps, with_assertions, false);
+    if (first == LOADS_CHANGED) sweep(temps, with_assertions, true);
+    if (first != DONE) promote_all_embedded_assignments();
+    return first != DONE;
 }

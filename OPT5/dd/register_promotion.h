@@ -6,6 +6,7 @@
 #include "OPT5/ir/list.h"
 
 #include <memory>
+#include <unordered_map>
 
 class NATURAL_LOOPS;
 struct NATURAL_LOOP;
@@ -32,6 +33,7 @@ struct PROMOTION_CANDIDATE {
     PROMOTION_CANDIDATE& operator=(const PROMOTION_CANDIDATE&) = delete;
 
     SSAVAR* variable;
+    SYMTAB* temp = nullptr; // once there is one
     NODE* reference = nullptr; // a copy of one without SSA operators, as the trees of the function are now; owned
     std::vector<PROMOTION_EVENT> events; // by block and place
     std::vector<size_t> cut; // headers of loops that have no register for it
@@ -42,17 +44,15 @@ struct PROMOTION_CANDIDATE {
 // The temporary of each place, one for all of its accesses: whenever it is read it holds what the place holds.
 class PROMOTION_TEMPS {
 public:
-    SYMTAB* of(const PROMOTION_CANDIDATE& c);
-    bool made_any() const { return !entries.empty(); }
+    SYMTAB* of(PROMOTION_CANDIDATE& c);
 
 private:
     struct ENTRY {
-        const SYMTAB* base;
         bool is_indirect;
         INT65 start, length;
         SYMTAB* temp;
     };
-    std::vector<ENTRY> entries;
+    std::unordered_map<const SYMTAB*, std::vector<ENTRY>> entries; // by object or pointer; looked up, never walked
 };
 
 constexpr size_t MOST_VALUES_IN_LOOP = 12; // that a loop has registers for

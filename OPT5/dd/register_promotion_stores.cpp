@@ -24,12 +24,15 @@
 #include "OPT5/simp/simp.h"
 
 #include <algorithm>
+#include <iterator>
+#include <numeric>
 #include <unordered_map>
 
 namespace {
 
 using CANDIDATE = PROMOTION_CANDIDATE;
 
+constexpr int64_t MOST_QUESTIONS = 50000; // about statements, and 8 for each of them; later candidates are left alone
 constexpr double LEAST_GAIN = 1.5; // stores that go for each that is inserted
 
 // A store of a candidate, or a statement (none) that another store must not pass.
@@ -48,15 +51,13 @@ struct STORED {
 // What a statement does that many candidates ask about.
 struct SUMMARY {
     LIST* cell;
+    const NODE* tree; // without the operators of SSA form over it
     size_t block;
     NODE* assignment = nullptr;        // of a definition, no compound one: the root
     const SSAVAR* stored = nullptr;    // which this is of
     bool is_barrier = false;           // for all
     bool is_indirect = false;          // accesses something through a pointer, or may
-    uint64_t names = 0;                // the symbols it mentions, by `mark_of`
 };
-
-uint64_t mark_of(const SYMTAB* sym) { return uint64_t{1} << (static_cast<uint64_t>(sym->uid) & 63); }
 
 class STORE_PROMOTER {
 public:
@@ -66,10 +67,10 @@ public:
 
 private:
     void summarize();
-    SUMMARY summary_of(LIST* cell, size_t block) const;
+    SUMMARY summary_of(LIST* cell, size_t block);
     void find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& candidates);
     void find_points(STORED& s);
-    bool may_touch(const SUMMARY& at, const STORED& s);
+    std::vector<size_t> statements_around(const SSAVAR* v) const;
     void find_dead_ends();
     void spare_registers();
     void promote(std::vector<STORED*> stored);
@@ -93,6 +94,8 @@ private:
     const NATURAL_LOOPS& loops;
     const FREQUENCIES frequencies;
     std::vector<SUMMARY> statements;
+    std::vector<size_t> indirect; // those that may touch what they do not name
+    std::unordered_map<const SYMTAB*, std::vector<size_t>> naming; // statements by symbol; looked up, never walked
     std::vector<STORED> all;
     std::vector<STORED*> batch;
     std::vector<bool> is_dead_end; // by block
@@ -102,9 +105,9 @@ private:
     bool any = false;
 };
 
-SUMMARY STORE_PROMOTER::summary_of(LIST* cell, size_t block) const {
-    SUMMARY s{cell, block};
-    const NODE* t = cell->first;
+SUMMARY STORE_PROMOTER::summary_of(LIST* cell, size_t block) {
+    const NODE* t = below_SSA(static_cast<const NODE*>(cell->first));
+    SUMMARY s{cell, t, block};
     s.is_barrier = t->op == RETURN || t->op == URETURN || may_leave_in_the_middle(t) ||
                    (cell->rest && tree_is_EH_SWITCH(cell->rest->first)) || tree_is_EH_SWITCH(t) || t->op == MEMCPY;
     for (NODE* n = cell->first; n && op_is_SSA(n->op) && n->op != SSA_USE; n = n->left)
@@ -112,8 +115,11 @@ SUMMARY STORE_PROMOTER::summary_of(LIST* cell, size_t block) const {
             s.assignment = ssa_assignment(n);
             s.stored = ssa_variable(n);
         }
-    for_each_subtree(t, [&s](const NODE* n) {
-        if (n->op == NAME && n->u.sym) s.names |= mark_of(n->u.sym);
+    for_each_subtree(t, [&](const NODE* n) {
+        if (n->op == NAME && n->u.sym) {
+            std::vector<size_t>& in = naming[n->u.sym];
+            if (in.empty() || in.back() != statements.size()) in.push_back(statements.size());
+        }
         s.is_indirect |= n->op == UMULT || n->op == STREF || op_is_intrinsic(n->op);
     });
     return s;
@@ -123,7 +129,9 @@ void STORE_PROMOTER::summarize() {
     for (size_t b = 1; b < forward.blocks.size(); ++b)
         for (LIST* s = forward.blocks[b]->statements; s; s = s->rest)
             if (s->first && s->first->op != SSA_PHI && s->first->op != PPRAGMA) statements.push_back(summary_of(s, b));
-    questions_left = 100000 + 64 * static_cast<int64_t>(statements.size());
+    questions_left = MOST_QUESTIONS + 8 * static_cast<int64_t>(statements.size());
+    for (size_t i = 0; i < statements.size(); ++i)
+        if (statements[i].is_barrier || statements[i].is_indirect) indirect.push_back(i);
 }
 
 bool may_be_stored_to(const CANDIDATE& c) {
@@ -160,19 +168,27 @@ bool touches(const NODE* tree, const STORED& s) {
     return tree_touches_lvalue(tree, s.c->reference) || tree_modifies_lvalue_in_tree(tree, s.c->reference);
 }
 
-bool STORE_PROMOTER::may_touch(const SUMMARY& at, const STORED& s) {
-    const SSAVAR* v = s.c->variable;
-    const bool is_named = at.names & mark_of(v->base());
-    if (v->sym && !v->is_memory() && !is_named) return false;
-    if (v->sym && !at.is_indirect && !is_named) return false;
-    if (--questions_left < 0) return true;
-    return touches(at.cell->first, s);
+// The statements that may touch the place, in order: of an object those that name it, and those that may reach what
+// they do not name.
+std::vector<size_t> STORE_PROMOTER::statements_around(const SSAVAR* v) const {
+    std::vector<size_t> found;
+    if (v->pointer) {
+        found.resize(statements.size());
+        std::iota(found.begin(), found.end(), size_t(0));
+        return found;
+    }
+    auto at = naming.find(v->sym);
+    if (at != naming.end())
+        std::set_union(at->second.begin(), at->second.end(), indirect.begin(), indirect.end(), std::back_inserter(found));
+    return found;
 }
 
 void STORE_PROMOTER::find_points(STORED& s) {
-    for (const SUMMARY& at : statements) {
+    for (size_t i : statements_around(s.c->variable)) {
+        const SUMMARY& at = statements[i];
         const bool stores = at.stored == s.c->variable;
-        if (stores ? touches(at.assignment->right, s) : at.is_barrier || may_touch(at, s))
+        if (!stores && !at.is_barrier) --questions_left;
+        if (stores ? touches(at.assignment->right, s) : at.is_barrier || touches(at.tree, s))
             s.points.push_back({at.block, nullptr});
         if (stores) s.points.push_back({at.block, at.cell});
     }
@@ -243,10 +259,6 @@ void STORE_PROMOTER::fill_sets(MOTION& motion) const {
                     s.demands &= ~bit;
                 }
         });
-    for (size_t b : backward.order)
-        for (size_t next : backward.before[b])
-            if (!EDGE_STATEMENTS::may_insert(backward.blocks[b], backward.blocks[next]))
-                motion.sets[b].closed = ~CANDIDATES(0);
 }
 
 // Code on edges is worth it where it stands for stores of a loop.
@@ -380,6 +392,8 @@ void STORE_PROMOTER::promote(std::vector<STORED*> stored) {
     INSERTIONS inserted = motion.latest_insertions_off_back_edges(loops);
     drop_poor_insertions(motion, inserted);
     decide(motion, inserted);
+    for (BBLK* bb : has_empty_cells) drop_empty_cells(&bb->statements);
+    has_empty_cells.clear();
 }
 
 bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidates) {
@@ -387,7 +401,9 @@ bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidat
     find_stored(candidates);
     if (all.empty()) return false;
     find_dead_ends();
-    for (STORED& s : all) find_points(s);
+    size_t known = 0;
+    for (; known < all.size() && questions_left > 0; ++known) find_points(all[known]);
+    all.resize(known, {nullptr, {}});
     spare_registers();
     size_t blocks = 0;
     for (size_t i = 0; i < all.size(); i += MOST_CANDIDATES) {
@@ -397,7 +413,6 @@ bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidat
         for (size_t k = i; k < std::min(i + MOST_CANDIDATES, all.size()); ++k) some.push_back(&all[k]);
         promote(std::move(some));
     }
-    for (BBLK* bb : has_empty_cells) drop_empty_cells(&bb->statements);
     on_edges.insert();
     return any;
 }

@@ -45,6 +45,15 @@ MOTION_GRAPH::MOTION_GRAPH(bool backward) : is_backward(backward) {
         }
 }
 
+MOTION_GRAPH::MOTION_GRAPH(const std::vector<std::vector<size_t>>& graph)
+    : is_backward(false), is_closed(graph.size(), false), blocks(graph.size(), nullptr), before(graph.size()),
+      after(graph) {
+    for (size_t b = 1; b < graph.size(); ++b) {
+        order.push_back(b);
+        for (size_t next : graph[b]) before[next].push_back(b);
+    }
+}
+
 MOTION::MOTION(const MOTION_GRAPH& graph) : sets(graph.blocks.size()), graph(graph) {
     for (size_t b : graph.order)
         if (graph.is_closed[b]) sets[b].closed = ALL;

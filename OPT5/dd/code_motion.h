@@ -23,7 +23,8 @@ constexpr size_t MOST_CANDIDATES = 64;
 
 // The blocks of the current function by `dfn`, as the direction of the motion sees them.
 struct MOTION_GRAPH {
-    explicit MOTION_GRAPH(bool backward);
+    explicit MOTION_GRAPH(bool backward); // of the current function
+    explicit MOTION_GRAPH(const std::vector<std::vector<size_t>>& after); // of numbers from 1 alone, seen forward
 
     const bool is_backward;
     std::vector<bool> is_closed; // by block: no statement can be put on some edge to its start

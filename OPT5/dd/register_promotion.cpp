@@ -204,7 +204,7 @@ private:
     void store_behind(CANDIDATE& c, EVENT& def, NODE* value);
     void tell(const char* what, CANDIDATE& c, const EVENT& e);
     NODE* load(CANDIDATE& c) {
-        return mk_ASG(mk_NAME(temps.of(c)), copy_tree(c.reference));
+        return mk_ASG(mk_NAME(temps.of(c)), copy_tree(c.reference, false));
     }
     template <class F>
     static void for_each_block(CANDIDATE& c, F&& visit) {

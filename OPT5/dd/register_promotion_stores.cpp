@@ -165,7 +165,8 @@ void STORE_PROMOTER::find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& 
 
 // The place itself, or the pointer to it.
 bool touches(const NODE* tree, const STORED& s) {
-    return tree_touches_lvalue(tree, s.c->reference) || tree_modifies_lvalue_in_tree(tree, s.c->reference);
+    const NODE* place = s.c->variable->tree;
+    return tree_touches_lvalue(tree, place) || tree_modifies_lvalue_in_tree(tree, place);
 }
 
 // The statements that may touch the place, in order: of an object those that name it, and those that may reach what
@@ -325,7 +326,7 @@ void STORE_PROMOTER::decide(const MOTION& motion, const INSERTIONS& inserted) {
                 if (!(life.edge_reads[b][i] >> k & 1)) continue;
                 CANDIDATE& c = *batch[k]->c;
                 on_edges.add(forward.blocks[forward.before[b][i]], forward.blocks[b],
-                             mk_ASG(copy_tree(c.reference), mk_NAME(temps.of(c))));
+                             mk_ASG(copy_tree(c.reference, false), mk_NAME(temps.of(c))));
                 any = true;
             }
 }

@@ -64,6 +64,23 @@ int swapped(int n) {
     return a * 10 + b;
 }
 
+// When control comes back to where the environment was saved, `a` need not hold what it held there.
+long environment[8];
+int setjmp(long*);
+// FUNCTION: comes_back
+// HAS: x = a
+// COUNT 1: /[+^] x/
+int comes_back(int n) {
+    int a = n * 3, x = a, s = 0;
+    if (setjmp(environment)) {
+        do s = told(s) ^ x;
+        while (--n);
+        return s;
+    }
+    while (n--) a = a * 2 + told(a);
+    return a;
+}
+
 // The effects of a dead assignment stay, and what they read.
 // FUNCTION: effects
 // COUNT 1: _told(

@@ -266,7 +266,30 @@ namespace {
 struct LISTED {
     const NODE* lvalue;
     const REFERENCE* record;
+    long statement; // counted through the function
 };
+
+std::vector<LISTED> list_references() {
+    std::vector<LISTED> all;
+    long statement = 0;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest, ++statement)
+            for_each_node(s->first, [&](NODE* t) {
+                const DDEPNODE* d = t->rare().dependence;
+                if (d) all.push_back({d->root, static_cast<const REFERENCE*>(d), statement});
+            });
+    return all;
+}
+
+void report_pair(const LISTED& x, const LISTED& y, int order) {
+    DDEP_PTR forward, backward;
+    compute_dependence_vectors(&forward, &backward, order, x.lvalue, x.record->block->loop, y.lvalue,
+                               y.record->block->loop, false, 0);
+    if (!forward && !backward) return;
+    debug_printf("\t\taliases (%ld) %s   lexorder: %d\n", y.statement, tree_to_infix(y.lvalue).c_str(), order);
+    if (forward) debug_printf("\t\t\t\tV1->V2: %s\n", forward->text().c_str());
+    if (backward) debug_printf("\t\t\t\tV2->V1: %s\n", backward->text().c_str());
+}
 
 std::string text_of(const REFERENCE& r) {
     std::string all = r.sum.is_exact ? "" : "wrapping ";
@@ -282,27 +305,18 @@ std::string text_of(const REFERENCE& r) {
 
 } // namespace
 
-// The value of a term behind `@` is fixed in the loop of that level.
+// Of a reference the form in which it is compared too: the value of a term behind `@` is fixed in the loop of that level.
 void report_all_dependences() {
     if (!loop_root() || !dependence_analysis_enabled) return;
-    std::vector<LISTED> all;
-    for_each_block_of(loop_root(), [&all](BBLK* bb) {
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            for_each_node(s->first, [&all](NODE* t) {
-                const DDEPNODE* d = t->rare().dependence;
-                if (d) all.push_back({d->root, static_cast<const REFERENCE*>(d)});
-            });
-    });
-    std::sort(all.begin(), all.end(),
-              [](const LISTED& x, const LISTED& y) { return x.record->number < y.record->number; });
-    for (const LISTED& x : all) {
-        debug_printf("%d: %s", x.record->number, tree_to_infix(x.lvalue).c_str());
-        debug_printf(" in loop%d, %s\n", x.record->block->loop->uid, text_of(*x.record).c_str());
+    const std::vector<LISTED> all = list_references();
+    const BBLK* last = nullptr;
+    for (size_t i = 0; i < all.size(); ++i) {
+        const LISTED& x = all[i];
+        if (x.record->block != last) debug_printf("  BB%d:\n", x.record->block->dfn);
+        last = x.record->block;
+        debug_printf("\t(%ld) %s\n", x.statement, tree_to_infix(x.lvalue).c_str());
+        debug_printf("\t\tin loop%d, %s\n", x.record->block->loop->uid, text_of(*x.record).c_str());
+        for (size_t j = 0; j < all.size(); ++j)
+            if (j != i) report_pair(x, all[j], static_cast<int>(j) - static_cast<int>(i));
     }
-    for (size_t i = 0; i < all.size(); ++i)
-        for (size_t j = i; j < all.size(); ++j) {
-            const REFERENCE &x = *all[i].record, &y = *all[j].record;
-            const DDEP_PTR v = compute_full_dependence_vector(x.root, x.block->loop, y.root, y.block->loop);
-            if (v) debug_printf("%d %d %s\n", x.number, y.number, v->text().c_str());
-        }
 }

@@ -2,6 +2,7 @@
 #include "OPT5/dd/dependence_vectors.h"
 
 #include "OPT5/dd/dd.h"
+#include "OPT5/dd/dependence.h"
 #include "OPT5/ir/global.h"
 #include "UTIL/abort.h"
 
@@ -167,7 +168,7 @@ bool DDEP::not_all_DVE_SAME(const NODE* v1, const NODE* v2, struct LOOP* loop) {
     for (const DVE& e : dve)
         if (!e.has_SAME_dir()) return NotAllSame = true;
     if (!v1 || !v2 || !loop) return false;
-    return false; // where they do not meet in one iteration, is not asked yet
+    return NotAllSame = !lvalues_collide_in_iteration(v1, v2, loop);
 }
 
 void DDEP::set_inverted() {

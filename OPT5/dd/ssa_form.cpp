@@ -100,11 +100,38 @@ struct EVENT {
     bool is_use; // otherwise a definition
 };
 
+// Lists by number, which keep their room from one function to the next: most functions are small, and there are many.
+template <class V>
+class REUSED_LISTS {
+public:
+    void restart(size_t count) {
+        if (lists.size() < count) lists.resize(count);
+        for (size_t i = 0; i < count; ++i) lists[i].clear();
+    }
+    std::vector<V>& operator[](size_t i) { return lists[i]; }
+
+private:
+    std::vector<std::vector<V>> lists;
+};
+
+struct BUILD_LISTS {
+    REUSED_LISTS<EVENT> events;           // by variable, in the order of blocks and sites
+    REUSED_LISTS<int> live_in;            // by variable: blocks at whose start it is live
+    REUSED_LISTS<int> definers;           // by variable: blocks with a definition or chi
+    REUSED_LISTS<uint32_t> live_at_entry; // by block
+    REUSED_LISTS<NODE*> phis;             // by block
+};
+BUILD_LISTS build_lists;
+
 class BUILDER {
 public:
-    explicit BUILDER(SSA_BUILD& build)
-        : build(build), variables(ssa_state.variables), events(variables.size()), live_in(variables.size()),
-          definers(variables.size()), live_at_entry(build.blocks.size()), phis(build.blocks.size()) {}
+    explicit BUILDER(SSA_BUILD& build) : build(build), variables(ssa_state.variables) {
+        events.restart(variables.size());
+        live_in.restart(variables.size());
+        definers.restart(variables.size());
+        live_at_entry.restart(build.blocks.size());
+        phis.restart(build.blocks.size());
+    }
     void run() {
         enter_uses();
         find_live_blocks();
@@ -133,11 +160,10 @@ private:
 
     SSA_BUILD& build;
     const std::vector<std::unique_ptr<SSAVAR>>& variables;
-    std::vector<std::vector<EVENT>> events;           // by variable, in the order of blocks and sites
-    std::vector<std::vector<int>> live_in;            // by variable: blocks at whose start it is live
-    std::vector<std::vector<int>> definers;           // by variable: blocks with a definition or chi
-    std::vector<std::vector<uint32_t>> live_at_entry; // by block
-    std::vector<std::vector<NODE*>> phis;             // by block
+    REUSED_LISTS<EVENT>& events = build_lists.events;
+    REUSED_LISTS<int>&live_in = build_lists.live_in, &definers = build_lists.definers;
+    REUSED_LISTS<uint32_t>& live_at_entry = build_lists.live_at_entry;
+    REUSED_LISTS<NODE*>& phis = build_lists.phis;
     // While chis are placed: what is live, that which is memory as a list.
     std::vector<SSAVAR*> live_memory;
     std::vector<int32_t> place_of; // by variable: 0 dead, below 0 live, otherwise 1 + its place in `live_memory`

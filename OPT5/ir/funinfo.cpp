@@ -29,7 +29,6 @@ std::mutex unsuppression_lock;
 namespace {
 
 // All records by symbol, and by name less its prefix. Guarded by `funinfo_lock`.
-std::unordered_map<const SYMTAB*, FUNINFO*> funinfo_by_symbol;
 std::unordered_map<std::string, FUNINFO*> funinfo_by_name;
 std::unordered_set<const SYMTAB*> nonconforming_functions;
 
@@ -98,7 +97,7 @@ FUNINFO* create_funinfo(const char* name, SYMTAB* sym, int known_system) {
     init_FUNINFO_flags(f, known_system);
     fileinfo.FUNLIST.push_back(f);
     funinfo_by_name.emplace(skip_name_prefix(name), f);
-    if (sym) funinfo_by_symbol.emplace(sym, f);
+    if (sym) sym->function_record = f;
     return f;
 }
 
@@ -115,12 +114,7 @@ FUNINFO* find_FUNINFO(const char* name) {
     return *name && is_system_function(name) ? create_funinfo(name, nullptr, 1) : nullptr;
 }
 
-FUNINFO* find_FUNINFO(SYMTAB* sym) {
-    std::unique_lock<std::mutex> guard(funinfo_lock, std::defer_lock);
-    if (max_threads > 0) guard.lock(); // every call in a tree is asked for
-    auto it = funinfo_by_symbol.find(sym);
-    return it == funinfo_by_symbol.end() ? nullptr : it->second;
-}
+FUNINFO* find_FUNINFO(SYMTAB* sym) { return sym->function_record; }
 
 FUNINFO* make_FUNINFO(const char* name) {
     if (FUNINFO* f = find_FUNINFO(name)) return f;
@@ -132,8 +126,7 @@ FUNINFO* make_FUNINFO(const char* name) {
 
 FUNINFO* make_FUNINFO(SYMTAB* sym) {
     std::lock_guard<std::mutex> guard(funinfo_lock);
-    auto it = funinfo_by_symbol.find(sym);
-    if (it != funinfo_by_symbol.end()) return it->second;
+    if (sym->function_record) return sym->function_record;
     FUNINFO* f = lookup_by_name(sym->name);
     if (f && !f->symbol && f != fileinfo.dummy) {
         f->symbol = sym;
@@ -142,7 +135,7 @@ FUNINFO* make_FUNINFO(SYMTAB* sym) {
         if (is_defined_here(sym) && TEST_FLAG(f, FUN_is_SYSTEM)) {
             clear_flags(f, ~uint64_t(FUN_is_main | FUN_is_cg_root | FUN_is_cpp));
         }
-        funinfo_by_symbol.emplace(sym, f);
+        sym->function_record = f;
         return f;
     }
     return create_funinfo(sym->name, sym, 0);

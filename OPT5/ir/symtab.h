@@ -105,6 +105,7 @@ public:
     bool lives_in_others = false; // its storage may lie in that of a symbol with `hosts_others`
     bool hosts_others = false;
     NODE* size_tree = nullptr;
+    FUNINFO* function_record = nullptr; // of a function that has one; ask `find_FUNINFO`
 
     SYMTAB();
     ~SYMTAB() override;

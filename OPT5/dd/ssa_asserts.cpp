@@ -20,10 +20,14 @@ public:
     void run() {
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
             for (LIST* s = bb->statements; s; s = s->rest)
-                if (s->first->op == NASSERT && !tree_has_side_effects(s->first->left)) s = assertion(s);
+                if (is_about_values(s->first)) s = assertion(s);
     }
 
 private:
+    static bool is_about_values(const NODE* t) { // not a mark of a variable
+        return t->op == NASSERT && t->left && t->left->op != ICALL && !tree_has_side_effects(t->left);
+    }
+
     // The last of the assertions that stand for it now.
     LIST* assertion(LIST* s) {
         std::vector<const NODE*> uses;

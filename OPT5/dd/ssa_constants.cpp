@@ -1,7 +1,7 @@
 // Constants and copies are put in place of what holds them, in SSA form.
 //
-// `x = 3; y = x + 1;` becomes `y = 4`: blocks are taken in an order in which definitions precede their uses, so that one
-// pass follows a chain of constants to its end, over phis with equal arguments too. From the second pass on a copy
+// `x = 3; y = x + 1;` becomes `y = 4`: blocks are taken in an order in which definitions precede their uses, so that
+// one pass follows a chain of constants to its end, over phis with equal arguments too. From the second pass on a copy
 // `x = a` of a register is seen through where that leaves no use of x, and a computation in a loop whose only use is
 // behind the loop is done there.
 //
@@ -40,12 +40,12 @@ struct VALUE {
         uint32_t variable;
         uint64_t state; // of the variable where the value is computed
     };
-    NODE* tree = nullptr;        // what replaces its uses; owned
-    std::vector<SOURCE> sources; // of a copy
+    NODE* tree = nullptr;          // what replaces its uses; owned
+    std::vector<SOURCE> sources;   // of a copy
     const BBLK* used_in = nullptr; // the block of the last use
-    uint32_t uses = 0;           // SSA_USEs that may be replaced
-    uint32_t other = 0;          // phis, may-definitions, places: those stay
-    bool is_copy = false;        // the value has sources, and has not been found to change
+    uint32_t uses = 0;             // SSA_USEs that may be replaced
+    uint32_t other = 0;            // phis, may-definitions, places: those stay
+    bool is_copy = false;          // the value has sources, and has not been found to change
 };
 
 bool has_definition(const NODE* t) {
@@ -53,7 +53,9 @@ bool has_definition(const NODE* t) {
 }
 
 // A fact about the variable itself, whatever its value.
-bool is_mark(const NODE* statement) { return statement->op == NASSERT && statement->left && statement->left->op == ICALL; }
+bool is_mark(const NODE* statement) {
+    return statement->op == NASSERT && statement->left && statement->left->op == ICALL;
+}
 
 bool is_unsuited(const SSAVAR* v) {
     const SYMTAB* sym = v->base();
@@ -190,7 +192,8 @@ private:
         if (!asg || value_of(d.node).tree || asg->left->op != NAME) return false;
         const SSAVAR* x = ssa_variable(d.node);
         VALUE& v = value_of(d.node);
-        if (!x->has(SSAVAR_likely_register) || is_restricted(x->tree->type) || v.uses == 0 || v.other != 0) return false;
+        if (!x->has(SSAVAR_likely_register) || is_restricted(x->tree->type) || v.uses == 0 || v.other != 0)
+            return false;
         v.sources.clear();
         if (count_nodes_in_tree(d.node) > MOST_NODES || !find_sources(asg->right, v) || v.sources.empty()) return false;
         return is_copied_variable(asg->right) || (v.uses == 1 && is_in_inner_loop(d.block, v.used_in));
@@ -331,7 +334,7 @@ private:
             }
         if (reads_place(t)) t = with_known_operand(t);
         t->left = replace(t->left, left_is_place(t) || (is_place && is_around_use(t)));
-        t->right = replace(t->right, false);
+        if (t->op != IF && t->op != SWITCH) t->right = replace(t->right, false); // labels
         // In normal form the constant terms of a pointer are in the subscript.
         if (trees_are_normalized && t->op == UMULT && (t->left->op == PLUS || t->left->op == PCONV))
             t->left = partition_pointer_under_UMULT(t->left, t);

@@ -7,10 +7,10 @@
 //
 // Needs: SSA form, a hierarchy, alias marks, dominators. Leaves: those, with new statements in preheaders.
 // Sound because the definitions of the uses dominate the loop's head and nothing in the loop defines their variables:
-// memory that is read there has a may-definition wherever it may change. A load through a pointer, DIV and MOD move only
-// where each execution of the loop evaluates the expression in its first iteration, ahead of any call and of any loop
-// within, which may not return: `for (...) if (d) s += n / d` stays. What is not certain to be evaluated may be computed
-// though nobody asked: its signed operations wrap.
+// memory that is read there has a may-definition wherever it may change. A load through a pointer, DIV and MOD move
+// only where each execution of the loop evaluates the expression in its first iteration, ahead of any call and of any
+// loop within, which may not return: `for (...) if (d) s += n / d` stays. What is not certain to be evaluated may be
+// computed though nobody asked: its signed operations wrap.
 #include "OPT5/dd/ssa.h"
 
 #include "OPT5/alias/effects.h"
@@ -35,11 +35,12 @@
 
 namespace {
 
-constexpr int LEAST_GOAL = 4;      // of `size_speed_goal`
-constexpr int MOST_NODES = 64;     // of an expression
-constexpr int MOST_COST = 999;     // blocks that all temporaries live through
-constexpr int MOST_TEMPORARIES = 6; // of a loop
-constexpr int SMALL_LOOP = 9;      // blocks
+constexpr int LEAST_GOAL = 4;              // of `size_speed_goal`
+constexpr int MOST_NODES = 64;             // of an expression
+constexpr int MOST_COST = 999;             // blocks that all temporaries live through
+constexpr int MOST_TEMPORARIES = 6;        // of a loop
+constexpr size_t MOST_BLOCKS_AHEAD = 64;   // between the head of a loop and what it evaluates for certain
+constexpr int SMALL_LOOP = 9;              // blocks
 constexpr int64_t MOST_STATEMENTS = 20000; // that are asked whether they change a load
 
 // A region constant expression.
@@ -120,7 +121,8 @@ bool is_named(const NODE* access) {
 
 bool may_trap(const NODE* t) {
     return any_subtree(t, [](const NODE* n) {
-        if (n->op == DIV || n->op == MOD) return n->right->op != ICON || n->right->u.lval.is_zero() || n->right->u.lval == INT65(-1);
+        if (n->op == DIV || n->op == MOD)
+            return n->right->op != ICON || n->right->u.lval.is_zero() || n->right->u.lval == INT65(-1);
         return (n->op == UMULT || n->op == STREF) && !is_named(n);
     });
 }
@@ -169,7 +171,8 @@ private:
     bool operands_hold(const NODE* t, struct LOOP* loop) {
         t = without_members(t);
         if (t->op == NAME) return true;
-        if (t->op == UMULT || t->op == STREF) return holds(t->left, loop) && (!t->right || t->right->op == FIELD || holds(t->right, loop));
+        if (t->op == UMULT || t->op == STREF)
+            return holds(t->left, loop) && (!t->right || t->right->op == FIELD || holds(t->right, loop));
         return op_is_SSA(t->op) && holds(t, loop);
     }
 
@@ -201,7 +204,8 @@ private:
         in.is_known = true;
         for (const LIST* s = bb->statements; s; s = s->rest) {
             bool writes = false;
-            for_each_write(s->first, [&writes](const WRITE& w) { writes |= !w.place || !is_private_name(below_SSA(w.place)); });
+            for_each_write(s->first,
+                           [&writes](const WRITE& w) { writes |= !w.place || !is_private_name(below_SSA(w.place)); });
             if (writes && s->first->op != SSA_PHI) in.statements.push_back(s->first);
         }
         return in.statements;
@@ -217,47 +221,52 @@ private:
 
 // ---- Certainty
 
-// Whether a loop that is entered evaluates what stands in `at`, ahead of the statement `before`, for certain.
+// Which blocks every execution of their innermost loop gets to in its first iteration, ahead of anything that may not
+// return.
 class CERTAINTY {
 public:
-    bool holds(const struct LOOP* loop, BBLK* at, const LIST* before) {
-        for (const LIST* s = at->statements; s && s != before; s = s->rest)
-            if (may_not_return(s->first)) return false;
-        if (before && may_not_return(before->first)) return false;
-        if (at == loop->head) return true;
-        std::vector<BBLK*> work;
-        BLOCK_SET ahead;
-        ahead.add(at);
-        std::vector<BBLK*> all;
-        auto add_predecessors = [&](const BBLK* bb) {
-            for (const EDGE* e = bb->predecessors; e; e = e->rest)
-                if (ahead.add(e->first)) work.push_back(e->first);
-        };
-        add_predecessors(at);
-        while (!work.empty()) {
-            BBLK* bb = work.back();
-            work.pop_back();
-            if (bb->loop != loop || !is_quiet(bb)) return false;
-            all.push_back(bb);
-            if (bb != loop->head) add_predecessors(bb);
-        }
-        for (const BBLK* bb : all)
-            for (const EDGE* e = bb->successors; e; e = e->rest)
-                if (e->first == loop->head || ahead.add(e->first)) return false;
-        return true;
+    bool holds_at_start(BBLK* bb) {
+        signed char& known = certain[bb];
+        if (known == 0) known = is_certain(bb) ? 1 : -1;
+        return known > 0;
     }
-
-private:
     bool is_quiet(const BBLK* bb) {
         signed char& known = quiet[bb];
         if (known == 0) {
             known = 1;
-            for (const LIST* s = bb->statements; s; s = s->rest)
+            for (const LIST* s = bb->statements; s && known > 0; s = s->rest)
                 if (may_not_return(s->first)) known = -1;
         }
         return known > 0;
     }
-    SIDE_TABLE<signed char> quiet; // 0: not asked yet
+
+private:
+    // Of what leads from the head to the block, all paths do.
+    bool is_certain(BBLK* at) {
+        const struct LOOP* loop = at->loop;
+        if (at == loop->head) return true;
+        ++now;
+        std::vector<BBLK*> ahead{at};
+        stamp[at] = now;
+        for (size_t i = 0; i < ahead.size(); ++i) {
+            if (ahead.size() > MOST_BLOCKS_AHEAD) return false;
+            if (ahead[i] == loop->head) continue;
+            for (const EDGE* e = ahead[i]->predecessors; e; e = e->rest) {
+                if (e->first->loop != loop || !is_quiet(e->first)) return false;
+                if (stamp[e->first] == now) continue;
+                stamp[e->first] = now;
+                ahead.push_back(e->first);
+            }
+        }
+        for (size_t i = 1; i < ahead.size(); ++i)
+            for (const EDGE* e = ahead[i]->successors; e; e = e->rest)
+                if (e->first == loop->head || stamp[e->first] != now) return false;
+        return true;
+    }
+
+    SIDE_TABLE<signed char> certain, quiet; // 0: not asked yet
+    SIDE_TABLE<unsigned> stamp;
+    unsigned now = 0;
 };
 
 class HOISTING {
@@ -265,7 +274,11 @@ public:
     void run() {
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
             if (!bb->loop || bb->loop->is_root()) continue;
-            for (LIST* s = bb->statements; s; s = s->rest) statement(s, bb);
+            is_certain_here = certainty.holds_at_start(bb);
+            for (LIST* s = bb->statements; s; s = s->rest) {
+                is_certain_here = is_certain_here && !may_not_return(s->first);
+                statement(s, bb);
+            }
         }
         RCXQ queue;
         for (const auto& rcx : all)
@@ -287,7 +300,9 @@ private:
 
     void statement(LIST* s, BBLK* bb) {
         const NODE* t = without_ssa(s->first);
-        if (t->op == SSA_PHI || t->op == NASSERT || t->op == ASSERT || t->op == PPRAGMA || t->op == ASM || tree_is_EH_SWITCH(t)) return;
+        if (t->op == SSA_PHI || t->op == NASSERT || t->op == ASSERT || t->op == PPRAGMA || t->op == ASM ||
+            tree_is_EH_SWITCH(t))
+            return;
         here = {nullptr, s, bb};
         is_conditional = false;
         for (NODE** place = &s->first; *place;) {
@@ -310,7 +325,8 @@ private:
                 visit(&t->left);
             return;
         }
-        if (t->left) op_is_SSA(t->op) || writes_left_operand(t->op) || is_load(t->op) ? place(&t->left, t) : visit(&t->left);
+        if (t->left)
+            op_is_SSA(t->op) || writes_left_operand(t->op) || is_load(t->op) ? place(&t->left, t) : visit(&t->left);
         const bool was_conditional = is_conditional;
         is_conditional |= t->op == QUEST || t->op == ANDAND || t->op == OROR;
         if (t->right && t->right->op != FIELD) visit(&t->right);
@@ -331,19 +347,25 @@ private:
     }
 
     static bool is_candidate(const NODE* t) {
+        if (!is_small(t)) return false;
         const NODE* access = without_ssa(t);
         if (access->op == NAME || op_is_SSA_definition(t->op) || is_named(access) || !is_plain(t->type)) return false;
         // An address that is kept in a variable would let the object be reached by pointers.
         if (!good_CSE_tree(access, false) || (t->type->is_pointer() && tree_contains_op(t, UAND))) return false;
         if (!is_load(access->op) && !computes(access->op)) return false;
-        return !is_of_variables(t) && count_nodes_in_tree(t) <= MOST_NODES;
+        return !is_of_variables(t);
+    }
+
+    static bool is_small(const NODE* t) {
+        int nodes_left = MOST_NODES;
+        return !any_subtree(t, [&nodes_left](const NODE*) { return --nodes_left < 0; });
     }
 
     // `hoist_invariants` moves it, once the inductions that it may be a part of are found.
     static bool is_of_variables(const NODE* t) {
         return !any_subtree(t, [](const NODE* n) {
-            return is_load(n->op) || (n->op == NAME && !is_private_name(n)) || ((n->op == DIV || n->op == MOD) && n->right->op != ICON) ||
-                   boolean_result[n->op];
+            return is_load(n->op) || (n->op == NAME && !is_private_name(n)) ||
+                   ((n->op == DIV || n->op == MOD) && n->right->op != ICON) || boolean_result[n->op];
         });
     }
 
@@ -353,7 +375,7 @@ private:
         struct LOOP* loop = here.block->loop;
         if (!invariance.holds(t, loop)) return false;
         const bool traps = may_trap(t);
-        bool is_certain = !is_conditional && certainty.holds(loop, here.block, here.cell);
+        bool is_certain = !is_conditional && is_certain_here;
         if (traps && !is_certain) return false;
         BBLK* at = here.block;
         if (is_conditional || !bb_dominates_bb(at, loop->tail) || !loop->preheader) return false;
@@ -361,7 +383,7 @@ private:
             struct LOOP* around = loop->parent;
             at = loop->preheader;
             if (around->is_root() || !around->preheader || !bb_dominates_bb(at, around->tail)) break;
-            const bool stays_certain = is_certain && certainty.holds(around, at, nullptr);
+            const bool stays_certain = is_certain && certainty.is_quiet(at) && certainty.holds_at_start(at);
             if ((traps && !stays_certain) || !invariance.holds(t, around)) break;
             is_certain = stays_certain;
             loop = around;
@@ -385,7 +407,8 @@ private:
     RCX& rcx_for(const NODE* t, struct LOOP* loop) {
         std::vector<RCX*>& candidates = by_hash[hash_of(t)];
         for (RCX* rcx : candidates)
-            if (rcx->loop == loop && equiv_mtypes(rcx->tree()->type, t->type) && trees_are_congruent(rcx->tree(), t, false))
+            if (rcx->loop == loop && equiv_mtypes(rcx->tree()->type, t->type) &&
+                trees_are_congruent(rcx->tree(), t, false))
                 return *rcx;
         all.push_back(std::make_unique<RCX>());
         RCX& rcx = *all.back();
@@ -431,7 +454,8 @@ private:
             erase_tree(old);
         }
         if (!rcx.is_certain)
-            value = rewrite_tree(value, [](NODE* t) { return is_exact_by_rule(t->op, t->type) ? kept_exact(t, nullptr) : t; });
+            value = rewrite_tree(value,
+                                 [](NODE* t) { return is_exact_by_rule(t->op, t->type) ? kept_exact(t, nullptr) : t; });
         insert_at_end_of_body(rcx.loop->preheader, mk_ASG(mk_NAME(temp), coerce_to_type(type, value)));
         make_sym_RC_in_loop(temp, rcx.loop);
         for (struct LOOP* l = rcx.loop->parent; l; l = l->parent) make_sym_altered_in_loop(temp, l);
@@ -440,10 +464,10 @@ private:
     INVARIANCE invariance;
     CERTAINTY certainty;
     std::vector<std::unique_ptr<RCX>> all;
-    std::unordered_map<size_t, std::vector<RCX*>> by_hash; // looked up alone
-    std::unordered_map<const struct LOOP*, int> hoisted_from;  // by the common loop; looked up alone
+    std::unordered_map<size_t, std::vector<RCX*>> by_hash;    // looked up alone
+    std::unordered_map<const struct LOOP*, int> hoisted_from; // by the common loop; looked up alone
     RCX::INSTANCE here = {};
-    bool is_conditional = false;
+    bool is_conditional = false, is_certain_here = false;
 };
 
 } // namespace

@@ -183,8 +183,10 @@ void COLLECTOR::definition(CANDIDATE* c, NODE* assignment) {
 
 class LOAD_PROMOTER {
 public:
-    LOAD_PROMOTER(const MOTION_GRAPH& graph, const std::vector<int>& first_stop, PROMOTION_TEMPS& temps, bool benign)
-        : graph(graph), first_stop(first_stop), temps(temps), benign(benign), loops(*currfuninfo->loops) {}
+    LOAD_PROMOTER(const MOTION_GRAPH& graph, const std::vector<int>& first_stop, PROMOTION_TEMPS& temps,
+                  const FREQUENCIES& frequencies, bool benign)
+        : graph(graph), first_stop(first_stop), temps(temps), frequencies(frequencies), benign(benign),
+          loops(*currfuninfo->loops) {}
     void run(const std::vector<CANDIDATE*>& batch, bool is_global);
     // What the batches decided: assignments take their places.
     bool finish();
@@ -198,6 +200,9 @@ private:
     void decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known);
     bool decide_reads(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& known, VALUE_LIFE& life);
     void decide_saves(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end);
+    double gain_of(size_t k, const INSERTIONS& inserted, const VALUE_LIFE& life,
+                   const std::vector<CANDIDATES>& live) const;
+    bool store_may_leave_loop(const CANDIDATE& c, const EVENT& def) const;
     void rewrite(CANDIDATE& c);
     void rewrite_use(CANDIDATE& c, EVENT& e);
     void rewrite_step(CANDIDATE& c, EVENT& use, EVENT& def);
@@ -217,6 +222,7 @@ private:
     const MOTION_GRAPH& graph;
     const std::vector<int>& first_stop;
     PROMOTION_TEMPS& temps;
+    const FREQUENCIES& frequencies;
     const bool benign;
     const NATURAL_LOOPS& loops;
     std::vector<CANDIDATE*> batch;
@@ -386,8 +392,12 @@ void LOAD_PROMOTER::decide(const INSERTIONS& inserted, const std::vector<CANDIDA
     for (size_t k = 0; k < batch.size(); ++k) {
         const CANDIDATES bit = CANDIDATES(1) << k;
         if (!(changed & bit)) continue;
-        any = true;
         decide_saves(*batch[k], bit, live);
+        if (gain_of(k, inserted, life, live) < 0) {
+            changed &= ~bit;
+            continue;
+        }
+        any = true;
         rewrite(*batch[k]);
     }
     for (size_t b : graph.order)
@@ -402,6 +412,39 @@ void LOAD_PROMOTER::decide(const INSERTIONS& inserted, const std::vector<CANDIDA
                 on_edges.add(from, to, load(*batch[k]));
             }
         }
+}
+
+// ---- What it is worth
+
+// Nothing else in the innermost loop around it may change the place: the second sweep will move the store.
+bool LOAD_PROMOTER::store_may_leave_loop(const CANDIDATE& c, const EVENT& def) const {
+    const NATURAL_LOOP* loop = loops.around(graph.blocks[def.block]);
+    return loop && std::none_of(c.events.begin(), c.events.end(), [&](const EVENT& e) {
+        return e.kind == EVENT::KILL && loops.contains(loop, graph.blocks[e.block]);
+    });
+}
+
+// The read of an object by its name costs an access and nothing else; each assignment to the temporary is an operation.
+double LOAD_PROMOTER::gain_of(size_t k, const INSERTIONS& inserted, const VALUE_LIFE& life,
+                              const std::vector<CANDIDATES>& live) const {
+    const CANDIDATE& c = *batch[k];
+    if (!name_accessed(c.reference)) return 0;
+    double gone = 0, assigned = 0;
+    for (size_t i = 0; i < c.events.size(); ++i) {
+        const EVENT& e = c.events[i];
+        const double runs = frequencies.of(graph.blocks[e.block]);
+        if (e.kind == EVENT::USE && e.is_deleted && e.link) gone += runs;
+        if (e.kind == EVENT::DEF && e.is_saved && store_may_leave_loop(c, e)) continue;
+        if (e.is_saved || (e.is_step && e.is_deleted && !c.events[i + 1].is_saved)) assigned += runs;
+    }
+    for (size_t b : graph.order)
+        for (size_t i = 0; i < graph.before[b].size(); ++i)
+            if (inserted[b][i] & (life.reads[b] | (live[b] & ~life.sets[b])) & (CANDIDATES(1) << k)) {
+                const double runs = frequencies.of_edge(graph.blocks[graph.before[b][i]], graph.blocks[b]);
+                gone -= runs;
+                assigned += runs;
+            }
+    return gone - assigned;
 }
 
 // ---- The trees
@@ -572,7 +615,7 @@ bool promote_loads(const std::vector<std::unique_ptr<CANDIDATE>>& all, PROMOTION
     std::stable_sort(candidates.begin(), candidates.end(),
                      [](const CANDIDATE* a, const CANDIDATE* b) { return a->weight > b->weight; });
     spare_registers(candidates, graph, frequencies);
-    LOAD_PROMOTER promoter(graph, collector.first_stop, temps, with_assertions);
+    LOAD_PROMOTER promoter(graph, collector.first_stop, temps, frequencies, with_assertions);
     size_t blocks = 0;
     for (size_t i = 0; i < candidates.size(); i += MOST_CANDIDATES) {
         const auto end = candidates.begin() + static_cast<long>(std::min(i + MOST_CANDIDATES, candidates.size()));

@@ -56,11 +56,13 @@ void init_dependence_analysis() {
 void redo_dependence_analysis(struct LOOP*) {
     if (!dependence_analysis_enabled) return;
     flush_DDEPNODEs_for_loop(loop_root());
+    forget_trip_limits();
     make_references(loop_root());
 }
 
 void wrapup_dependence_analysis(bool keep) {
     if (!keep && dependence_analysis_enabled && loop_root()) flush_DDEPNODEs_for_loop(loop_root());
+    forget_trip_limits();
     dependence_analysis_enabled = false;
 }
 
@@ -106,8 +108,8 @@ struct QUESTION {
     bool byType = true;
     int spec = 0;
     int order = 0;
-    bool early = false;  // only the vector in that order is wanted
-    int sameLevels = 0;  // of so many levels, from the outermost one, the iterations are the same
+    bool early = false; // only the vector in that order is wanted
+    int sameLevels = 0; // of so many levels, from the outermost one, the iterations are the same
 
     bool is_one_access() const { return v1 == v2; }
 };

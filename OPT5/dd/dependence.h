@@ -26,19 +26,19 @@ struct LOOP;
 
 // ---- Life
 extern thread_local bool dependence_analysis_enabled;
-void init_dependence_analysis();         // of the current function, whose loop hierarchy must be there
+void init_dependence_analysis();                  // of the current function, whose loop hierarchy must be there
 void redo_dependence_analysis(struct LOOP* loop); // the DDEPNODEs are made anew after a change in the loop
 void wrapup_dependence_analysis(bool keep);       // `keep`: the DDEPNODEs stay with their nodes
 void flush_DDEPNODEs_for_loop(struct LOOP* loop); // and those in it
-void report_all_dependences();           // the references and their vectors, to the debug stream
+void report_all_dependences();                    // the references and their vectors, to the debug stream
 
 // Null of a tree that is no UMULT with a record; members (STDOT) are looked below.
 DDEPNODE* get_DDEPNODE_from_tree(const NODE* tree);
 struct LOOP* get_loop_from_DDEPNODE_tree(const NODE* tree); // null without a record
 
 // ---- Vectors. Null: independent.
-// Of `v1`, evaluated in `l1`, and `v2` in `l2`. A distance of a level is the iteration of `v2` less that of `v1`, of the
-// loop of that level around both. `order`: above 0, `v1` comes first in one iteration; below, `v2`; 0: not known.
+// Of `v1`, evaluated in `l1`, and `v2` in `l2`. A distance of a level is the iteration of `v2` less that of `v1`, of
+// the loop of that level around both. `order`: above 0, `v1` comes first in one iteration; below, `v2`; 0: not known.
 // `*fwd` is the vector of dependences from `v1` to `v2`, made feasible in that order; `*bwd`, where `bwd` is not null,
 // of those from `v2` to `v1`. `assumeRC`: the caller vouches that the bases do not change between the two. `spec` above 0:
 // only the innermost `spec` loops are taken to carry a dependence. `byType`: accesses of types that tell them apart are
@@ -55,7 +55,7 @@ bool lvalues_have_non_carried_dDeps_in_loop(const NODE* v1, const NODE* v2, stru
 bool lvalues_are_dependent(const NODE* v1, const NODE* v2, struct LOOP* l1, struct LOOP* l2);
 
 // ---- Effects. `sameIteration`: of one iteration of the innermost loops named; otherwise of any two.
-// Whether evaluating `t1` may change what `t2` reads.
+// Whether evaluating `t1` may change what `t2` reads or writes.
 bool tree_affects_tree(const NODE* t1, const NODE* t2, struct LOOP* l1, struct LOOP* l2, bool sameIteration);
 bool trees_are_dependent(const NODE* t1, const NODE* t2, struct LOOP* l1, struct LOOP* l2, bool sameIteration);
 // Whether evaluating `t` may read or write the object of `lv`.
@@ -64,7 +64,7 @@ bool tree_touches_lvalue(const NODE* t, const NODE* lv, struct LOOP* l1, struct 
 // ---- Subscripts. Results are new trees; null stands for 0.
 NODE* canonicalize_ss_delta(const NODE* ss1, const NODE* ss2, struct LOOP* loop, bool simplify); // ss1 - ss2
 NODE* canonicalize_symbolic_ss(const NODE* ss, struct LOOP* loop, bool simplify);
-// Whether the tree has one value in all iterations that `vector` allows of the loops around `loop` and of itself; of all
-// where it is null.
+// Whether the tree has one value in all iterations that `vector` allows of the loops around `loop` and of itself; of
+// all where it is null.
 bool tree_is_RC_in_loop_nest(const NODE* tree, struct LOOP* loop, const DDEP* vector);
 bool tree_is_RC_in_common_loop(const NODE* tree, struct LOOP* l1, struct LOOP* l2);

@@ -1,9 +1,8 @@
 // Whether evaluating one tree may change what another reads, iteration by iteration.
 //
 // Sound because every write of the one is held against every access of the other: of places by their dependence, in
-// the same iteration or in any, and of what calls, copies and assembly do by the rules on effects. Those rules compare
-// places as evaluated with the same values of their variables; a place whose address varies in the loops is asked in
-// the loop around both instead.
+// the same iteration or in any, and of what calls, copies and assembly do by the rules on effects. Those ask for
+// the object that a place lies in for certain, whatever its address is in an iteration.
 #include "OPT5/dd/dependence.h"
 
 #include "OPT5/alias/alias.h"
@@ -41,44 +40,29 @@ bool any_access(const NODE* t, const F& visit) {
     if (t->op == STDOT || t->op == UMULT || t->op == STREF) {
         if (visit(t)) return true;
         const NODE* object = without_members(t);
-        return object->op != NAME && (any_access(object->left, visit) ||
-                                      (object->op == UMULT && any_access(object->right, visit)));
+        return object->op != NAME &&
+               (any_access(object->left, visit) || (object->op == UMULT && any_access(object->right, visit)));
     }
     if (t->op == UAND && name_of_place(t->left)) return false;
     return any_access(t->left, visit) || any_access(t->right, visit);
 }
 
 // Acts on more than the places it shows: a call, a copy of memory, assembly.
-bool acts_on_memory(const NODE* t) { return op_is_call(t->op) || t->op == MEMCPY || t->op == ASM || may_write_indirectly(t); }
+bool acts_on_memory(const NODE* t) {
+    return op_is_call(t->op) || t->op == MEMCPY || t->op == ASM || may_write_indirectly(t);
+}
 
-// By its variables' present values the call's own question cannot be put to a place of another iteration.
-bool is_call_kept_from(const NODE* call, const NODE* place, bool reads_count) {
-    return !call_may_modify(call, place) && !(reads_count && call_may_read(call, place));
+bool call_may_access(const NODE* call, const NODE* place) {
+    return call_may_modify(call, place) || call_may_read(call, place);
 }
 
 bool any_call(const NODE* t) { return any_subtree(t, acts_on_memory); }
 
-// Whether a write by `by` may reach a place that `t` reads, or writes where `writes_count`.
-bool write_reaches(const WRITE& w, const NODE* t, const LOOPS& in, bool writes_count) {
+// Whether the write may reach a place that evaluating `t` reads or writes: two writes of one place have an order too.
+bool write_reaches(const WRITE& w, const NODE* t, const LOOPS& in) {
     const NODE* x = w.place && w.by->op != MEMCPY ? access_of_place(w.place) : nullptr; // a copy writes on behind
-    auto is_reached = [&](const NODE* y) { return x ? places_meet(x, y, in) : !is_call_kept_from(w.by, y, false); };
-    if (!writes_count && writes_left_operand(t->op)) {
-        // The place that is given a value is not read by a plain assignment; what its address is made of is.
-        const bool is_plain = t->op == ASG || t->op == STASG || t->op == ARASG;
-        const NODE* place = access_of_place(t->left);
-        const bool by_left = is_plain ? place->op != NAME && any_access(without_members(place)->left, is_reached)
-                                      : any_access(t->left, is_reached);
-        if (by_left || (is_plain && without_members(place)->op == UMULT &&
-                        any_access(without_members(place)->right, is_reached)))
-            return true;
-        if (t->right && write_reaches(w, t->right, in, writes_count)) return true;
-    } else if (any_access(t, is_reached)) {
-        return true;
-    }
-    return any_subtree(t, [&](const NODE* n) {
-        if (!acts_on_memory(n)) return false;
-        return !x || call_may_read(n, x) || (writes_count && call_may_modify(n, x));
-    });
+    if (any_access(t, [&](const NODE* y) { return x ? places_meet(x, y, in) : call_may_modify(w.by, y); })) return true;
+    return any_subtree(t, [x](const NODE* n) { return acts_on_memory(n) && (!x || call_may_access(n, x)); });
 }
 
 bool is_volatile_access(const NODE* t) { return is_lvalue(t) && lvalue_is_volatile(t); }
@@ -89,7 +73,7 @@ bool tree_affects_tree(const NODE* t1, const NODE* t2, struct LOOP* l1, struct L
     if (tree_contains_op(t2, ASM) || tree_contains_op(t1, ASM)) return true;
     const LOOPS in{l1, l2, sameIteration};
     bool affects = false;
-    for_each_write(t1, [&](const WRITE& w) { affects = affects || write_reaches(w, t2, in, false); });
+    for_each_write(t1, [&](const WRITE& w) { affects = affects || write_reaches(w, t2, in); });
     if (affects) return true;
     // Reading what is volatile is an act, which keeps its place among others and among calls.
     return any_subtree(t1, is_volatile_access) && (any_subtree(t2, is_volatile_access) || any_call(t2));
@@ -103,5 +87,5 @@ bool tree_touches_lvalue(const NODE* t, const NODE* lv, struct LOOP* l1, struct 
     if (tree_contains_op(t, ASM)) return true;
     const LOOPS in{l1, l2, sameIteration};
     if (any_access(t, [&](const NODE* x) { return places_meet(x, lv, in); })) return true;
-    return any_subtree(t, [&](const NODE* n) { return acts_on_memory(n) && !is_call_kept_from(n, lv, true); });
+    return any_subtree(t, [&](const NODE* n) { return acts_on_memory(n) && call_may_access(n, lv); });
 }

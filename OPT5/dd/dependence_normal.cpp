@@ -7,11 +7,11 @@
 //
 // Needs: the loop hierarchy with its records, trees in normal form, marks of aliased objects.
 // Leaves: trees as they are; a record at each UMULT of the blocks of loops and of the function's body.
-// Sound because a NAME in the sum is fixed in the loops that are noted with it: what is in two sums stands for one value
-// while those iterate. A value known at the reference was assigned on all paths to it in the same iteration, and nothing
-// that it reads has been written since. Of a term that is read ahead of a loop each variable must be unchanged in that
-// loop; otherwise it is not the variable that is meant but the value that it had. An update of an induction variable
-// counts from its own statement on.
+// Sound because a NAME in the sum is fixed in the loops that are noted with it: what is in two sums stands for one
+// value while those iterate. A value known at the reference was assigned on all paths to it in the same iteration, and
+// nothing that it reads has been written since. Of a term that is read ahead of a loop each variable must be unchanged
+// in that loop; otherwise it is not the variable that is meant but the value that it had. An update of an induction
+// variable counts from its own statement on.
 #include "OPT5/dd/reference_form.h"
 
 #include "OPT5/alias/effects.h"
@@ -65,9 +65,10 @@ struct POINT {
         return nullptr;
     }
     void forget(const SYMTAB* sym) {
-        known.erase(std::remove_if(known.begin(), known.end(),
-                                   [sym](const ASSIGNED& a) { return a.sym == sym || sym_appears_in_tree(sym, a.value); }),
-                    known.end());
+        known.erase(
+            std::remove_if(known.begin(), known.end(),
+                           [sym](const ASSIGNED& a) { return a.sym == sym || sym_appears_in_tree(sym, a.value); }),
+            known.end());
     }
     void forget_written(const NODE* tree, bool below_root) {
         for_each_written_name(tree, [&](const NODE* name, const NODE* by) {
@@ -80,8 +81,8 @@ struct POINT {
 bool is_computed_from_variables(const NODE* t) {
     return !any_subtree(t, [](const NODE* n) {
         if (n->op == NAME) return !only_its_name_reaches(n->u.sym);
-        return op_has_effect(n->op) || op_is_call(n->op) || op_is_intrinsic(n->op) || n->op == UMULT || n->op == STREF ||
-               n->op == STDOT || n->op == UAND;
+        return op_has_effect(n->op) || op_is_call(n->op) || op_is_intrinsic(n->op) || n->op == UMULT ||
+               n->op == STREF || n->op == STDOT || n->op == UAND;
     });
 }
 bool is_readable(const NODE* t) {
@@ -101,7 +102,9 @@ public:
         t->u.rval = reinterpret_cast<void*>(it->second);
         return t;
     }
-    struct LOOP* loop_of(const NODE* mix) const { return loops[reinterpret_cast<uintptr_t>(mix->u.rval) - FIRST]; }
+    struct LOOP* loop_of(const NODE* mix) const {
+        return loops[reinterpret_cast<uintptr_t>(mix->u.rval) - FIRST];
+    }
 
 private:
     static constexpr uintptr_t FIRST = 2;
@@ -127,8 +130,10 @@ public:
         for (; loop && sym_is_RC_in_loop(sym, loop); loop = loop->parent) outermost = loop;
         return outermost;
     }
-    // What the variable holds ahead of the loop, or null; owned here.
+    // What the variable holds ahead of the loop, or null; owned here or by the loop's record.
     const NODE* value_ahead(const SYMTAB* sym, struct LOOP* loop) {
+        if (auto it = loop->record_of.find(sym); it != loop->record_of.end() && it->second->has(IV_is_RC))
+            return it->second->init;
         const auto [it, is_new] = ahead.try_emplace({sym, loop}, nullptr);
         constexpr int BUDGET = 1000, DEPTH = 10;
         if (is_new && loop->preheader)
@@ -161,8 +166,8 @@ private:
         return false;
     }
 
-    std::unordered_map<const SYMTAB*, struct LOOP*> counted;     // looked up alone
-    std::unordered_map<const struct LOOP*, std::vector<ANSWER>> asked; // looked up alone
+    std::unordered_map<const SYMTAB*, struct LOOP*> counted;             // looked up alone
+    std::unordered_map<const struct LOOP*, std::vector<ANSWER>> asked;   // looked up alone
     std::map<std::pair<const SYMTAB*, const struct LOOP*>, NODE*> ahead; // looked up alone
 
 public:
@@ -181,12 +186,23 @@ struct NEST_STEP {
     WIDE total = 0, before = 0;
 };
 
+NEST_STEP step_over_nest(const SYMTAB* sym, struct LOOP* inner);
+
 // What all iterations of the loop add, if that is a constant.
 std::optional<WIDE> moved_by_loop(const SYMTAB* sym, struct LOOP* loop) {
-    const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, false);
-    const bool is_counted = loop->trips && loop->trips->op == ICON && loop->is_bottom_tested() && !loop->has(LOOP_early_exit);
-    if (!iv || !is_counted || !iv->has(IV_affine) || !iv->incrtree || iv->incrtree->op != ICON) return std::nullopt;
-    return to_wide(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type)) * to_wide(loop->trips->u.lval);
+    if (!loop->trips || loop->trips->op != ICON || !loop->is_bottom_tested() || loop->has(LOOP_early_exit))
+        return std::nullopt;
+    const WIDE trips = to_wide(loop->trips->u.lval);
+    if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, false)) {
+        if (!iv->has(IV_affine) || !iv->incrtree || iv->incrtree->op != ICON) return std::nullopt;
+        return to_wide(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type)) * trips;
+    }
+    for (BBLK* bb : loop->contents)
+        if (bb->loop != loop && !sym_is_RC_in_loop(sym, bb->loop)) {
+            const NEST_STEP step = step_over_nest(sym, bb->loop);
+            return step.is_known ? std::optional<WIDE>(step.total * trips) : std::nullopt;
+        }
+    return std::nullopt;
 }
 
 std::optional<WIDE> amount_of(const INDUCTION_UPDATE& u);
@@ -229,7 +245,19 @@ class ADDRESS_READER final : public LINEAR_READER {
 public:
     ADDRESS_READER(REFERENCE* r, const POINT& p, KEPT_VALUES& k, ENTRY_VALUES& e)
         : LINEAR_READER(&r->sum, MOST_NODES), made(*r), point(p), kept(k), entries(e), loop(p.loop) {}
+    // Of an integer that is part of what `outer` reads, modulo its own width.
+    ADDRESS_READER(const ADDRESS_READER& outer, LINEAR_FORM* f, const TYPE* type)
+        : LINEAR_READER(f, MOST_NODES), made(outer.made), point(outer.point), kept(outer.kept), entries(outer.entries),
+          loop(outer.loop), entered(outer.entered), depth(outer.depth + 1), wrapping(type) {}
 
+    // The greatest value of a tree that is read ahead of the loop of the point, or NO_LAST.
+    WIDE greatest_ahead(const NODE* t) {
+        const bool is_read = at_entry(point.loop, [&] { return read(t, 1); });
+        if (!is_read || (!form.is_exact && t->type->size != ADDRESS_BITS)) return NO_LAST;
+        WIDE low = form.constant, high = form.constant;
+        const WIDE limit = WIDE(1) << (ADDRESS_BITS - 1);
+        return add_bounds(form, &low, &high) && low >= -limit && high < limit ? high : NO_LAST;
+    }
     void read_address(const NODE* umult) {
         LINEAR_FORM& sum = made.sum;
         if (!read(umult->left, 1) || (umult->right && !read(umult->right, 1))) {
@@ -251,30 +279,33 @@ private:
 
     bool opens(const NODE* t, const LINEAR_STEP& step) override {
         if (t->type->is_pointer()) return opens_pointer(t, step);
-        if (!is_plain_integer(t->type) || t->op == NOTB || t->op == PCONV || t->op == ISP2CHAR) return false;
-        if (t->op == SCONV) return opens_cast(t);
+        if (!is_plain_integer(t->type) || t->op == NOTB || t->op == ISP2CHAR) return false;
+        if (t->op == SCONV || t->op == PCONV) return opens_cast(t);
         if (t->op == PMCONV) // within an object
             return is_plain_integer(t->left->type) && t->right->u.lval.value % ADDRESS_UNIT_BITS == 0;
         if (!same_integers(step.a->type, t->type) || (step.b && !same_integers(step.b->type, t->type))) return false;
-        if (is_exact_by_rule(t->op, t->type) || operation_is_exact(t, loop)) return true;
-        if (t->type->size < ADDRESS_BITS) return false;
-        form.is_exact = false;
-        return true;
+        return is_exact_by_rule(t->op, t->type) || operation_is_exact(t, loop) ||
+               (wrapping && same_integers(t->type, wrapping));
     }
     static bool opens_pointer(const NODE* t, const LINEAR_STEP& step) {
-        if (t->op == PCONV || t->op == ISP2CHAR) return t->left->type->is_pointer() && t->left->type->size == t->type->size;
+        if (t->op == PCONV || t->op == ISP2CHAR)
+            return t->left->type->is_pointer() && t->left->type->size == t->type->size;
         if (t->op == MINUS) return step.a->type->is_pointer() && is_plain_integer(step.b->type);
         return t->op == PLUS && step.a->type->is_pointer() != step.b->type->is_pointer();
     }
     bool opens_cast(const NODE* cast) {
         const TYPE *from = cast->left->type, *to = cast->type;
+        if (from->is_pointer() && from->size == to->size && form.bits <= to->size) { // an address as a number
+            form.is_exact = false;
+            return true;
+        }
         if (!is_plain_integer(from)) return false;
-        if (from->size <= to->size && (from->is_unsigned() == to->is_unsigned() ||
-                                       (from->is_unsigned() && from->size < to->size)))
+        if (from->size <= to->size &&
+            (from->is_unsigned() == to->is_unsigned() || (from->is_unsigned() && from->size < to->size)))
             return true;
         if (range_of_tree(cast->left, loop).is_within(range_of_type(to))) return true;
-        if (to->size < ADDRESS_BITS) return false;
-        form.is_exact = false;
+        if (to->size < form.bits) return false;
+        form.is_exact = false; // equal modulo the width of the sum
         return true;
     }
 
@@ -282,13 +313,59 @@ private:
 
     bool leaf(const NODE* t, int64_t k) override {
         if (nodes_left < 0 || depth > MOST_DEPTH) return false;
-        if (t->op == UAND && t->type->is_pointer() && k == 1) return read_place(t->left);
+        if (t->op == UAND && t->type->is_pointer()) return read_place(t->left, k);
         if (t->op == NAME && is_readable_variable(t)) return variable(t, k);
+        if (is_wrapping_sum(t)) return wrapping_sum(t, k);
         if (!is_opened_inside(t)) return form.add(own(copy_tree(t)), k);
         return form.add(own(with_values(copy_tree(t))), k);
     }
+    // An unsigned sum, or a shift. All of it is one sum modulo its width, and that number itself where it lies in the
+    // type.
+    static bool is_wrapping_sum(const NODE* t) {
+        LINEAR_STEP step;
+        return is_plain_integer(t->type) && (t->type->is_unsigned() || t->op == SLL) && t->op != SCONV &&
+               t->op != NOTB && linear_step(t, &step) && same_integers(step.a->type, t->type) &&
+               (!step.b || same_integers(step.b->type, t->type));
+    }
+    bool wrapping_sum(const NODE* t, int64_t k) {
+        LINEAR_FORM part(static_cast<unsigned>(t->type->size));
+        ADDRESS_READER reader(*this, &part, t->type->stqs());
+        const bool is_read = depth < MOST_DEPTH && reader.read(t, 1);
+        if (!is_read || (!lies_in_type(&part, t->type) && t->type->size < ADDRESS_BITS)) {
+            return form.add(own(is_opened_inside(t) ? with_values(copy_tree(t)) : copy_tree(t)), k);
+        }
+        if (!lies_in_type(&part, t->type)) form.is_exact = false;
+        form.add_constant(form.reduced(WIDE(k) * part.constant));
+        for (const LINEAR_FORM::TERM& term : part)
+            if (!form.add(term.tree, form.reduced(WIDE(k) * term.coefficient))) return false;
+        return true;
+    }
+    // The constant of the sum may be off by a multiple of the modulus: it is the one that gives numbers of the type.
+    bool lies_in_type(LINEAR_FORM* sum, const TYPE* type) {
+        const RANGE all = range_of_type(type);
+        const WIDE modulus = all.max - all.min + 1;
+        WIDE low = 0, high = 0;
+        if (!add_bounds(*sum, &low, &high)) return false;
+        if (sum->bits >= 64) return sum->constant + low >= all.min && sum->constant + high <= all.max;
+        for (WIDE c : {WIDE(sum->constant), sum->constant + modulus})
+            if (c + low >= all.min && c + high <= all.max) {
+                sum->constant = static_cast<int64_t>(c);
+                return true;
+            }
+        return false;
+    }
+    bool add_bounds(const LINEAR_FORM& sum, WIDE* low, WIDE* high) {
+        for (const LINEAR_FORM::TERM& t : sum) {
+            const TERM_FACTS f = facts_of(t.tree);
+            const WIDE first = f.counts ? 0 : f.range.min, last = f.counts ? last_iteration(f.counts) : f.range.max;
+            if ((!f.counts && !f.is_bounded) || last >= NO_LAST) return false;
+            *low += std::min(t.coefficient * first, t.coefficient * last);
+            *high += std::max(t.coefficient * first, t.coefficient * last);
+        }
+        return true;
+    }
     // The address of the place: of an object, or the pointer and what is added.
-    bool read_place(const NODE* place) {
+    bool read_place(const NODE* place, int64_t k) {
         int64_t bits = 0;
         const NODE* object = place;
         while (object->op == STDOT && object->right->mval && !object->right->mval->is_bitfld) {
@@ -296,10 +373,10 @@ private:
             object = object->left;
         }
         if (bits % ADDRESS_UNIT_BITS || (object->op != NAME && object->op != UMULT))
-            return form.add(own(maketree(UAND, copy_tree(place), nullptr, tp->mk_ptr(place->type))), 1);
-        form.add_constant(bits / ADDRESS_UNIT_BITS);
-        if (object->op == UMULT) return read(object->left, 1) && (!object->right || read(object->right, 1));
-        return form.add(own(maketree(UAND, mk_NAME(object->u.sym), nullptr, tp->mk_ptr(tp->void_t))), 1);
+            return form.add(own(maketree(UAND, copy_tree(place), nullptr, tp->mk_ptr(place->type))), k);
+        form.add_constant(form.reduced(WIDE(k) * (bits / ADDRESS_UNIT_BITS)));
+        if (object->op == UMULT) return read(object->left, k) && (!object->right || read(object->right, k));
+        return form.add(own(maketree(UAND, mk_NAME(object->u.sym), nullptr, tp->mk_ptr(tp->void_t))), k);
     }
     bool is_readable_variable(const NODE* t) const {
         return t->u.sym && same_numbers(t->type, t->u.sym->type) && !kept.loop_counted_by(t->u.sym) &&
@@ -310,21 +387,16 @@ private:
         const SYMTAB* sym = t->u.sym;
         if (entered && !sym_is_RC_in_loop(sym, entered)) return value_on_entry(sym, entered, k);
         if (const NODE* value = entered ? nullptr : point.value_of(sym))
-            if (same_numbers(value->type, t->type) && is_readable(value)) return at_depth([&] { return read(value, k); });
+            if (same_numbers(value->type, t->type) && is_readable(value))
+                return at_depth([&] { return read(value, k); });
         if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, true))
             if (is_affine(iv)) return induction(iv, k);
-        if (const LOOPIV* rc = record_of_invariant(sym))
-            return at_entry(rc->loop, [&] { return read(rc->init, k); });
+        if (struct LOOP* keeps = kept.keeps_variable(sym, entered ? entered : loop); keeps && !keeps->is_root()) {
+            const NODE* value = kept.value_ahead(sym, keeps);
+            if (value && same_numbers(value->type, sym->type) && is_readable(value))
+                return at_entry(keeps, [&] { return read(value, k); });
+        }
         return form.add(own(copy_tree(t)), k);
-    }
-    const LOOPIV* record_of_invariant(const SYMTAB* sym) const {
-        for (struct LOOP* l = loop; l && sym_is_RC_in_loop(sym, l); l = l->parent)
-            if (auto it = l->record_of.find(sym); it != l->record_of.end() && it->second->has(IV_is_RC))
-                return it->second->init && same_numbers(it->second->init->type, sym->type) && !l->is_root() &&
-                               is_readable(it->second->init)
-                           ? it->second
-                           : nullptr;
-        return nullptr;
     }
 
     // ---- Induction variables
@@ -339,7 +411,15 @@ private:
     }
     static std::optional<WIDE> moved_in_head(const LOOPIV* iv);
     bool is_affine(const LOOPIV* iv) const {
-        return iv->has(IV_affine) && iv->loop->VLCV && iv->incrtree && iv->incrtree->op == ICON && moved_by(iv);
+        if (!iv->has(IV_affine) || !iv->loop->VLCV || !iv->incrtree || !moved_by(iv)) return false;
+        return iv->incrtree->op == ICON ||
+               (is_plain_integer(iv->incrtree->type) && is_computed_from_variables(iv->incrtree));
+    }
+    // The count of iterations times the step.
+    bool add_steps(const LOOPIV* iv, int64_t k) {
+        NODE* count = mk_NAME(iv->loop->VLCV->sym);
+        if (iv->incrtree->op == ICON) return form.add(own(count), form.reduced(WIDE(k) * step_of(iv)));
+        return form.add(own(maketree(MULT, count, coerce_to_type(tp->long_t, copy_tree(iv->incrtree)), tp->long_t)), k);
     }
     static int64_t step_of(const LOOPIV* iv) {
         return static_cast<int64_t>(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type).value);
@@ -347,7 +427,7 @@ private:
 
     bool induction(const LOOPIV* iv, int64_t k) {
         form.add_constant(form.reduced(WIDE(k) * *moved_by(iv)));
-        if (!form.add(own(mk_NAME(iv->loop->VLCV->sym)), form.reduced(WIDE(k) * step_of(iv)))) return false;
+        if (!add_steps(iv, k)) return false;
         if (const NODE* init = readable_init(iv)) {
             if (init->op == ICON) {
                 form.is_exact = form.is_exact && is_signed_number(init, iv->sym->type);
@@ -403,7 +483,8 @@ private:
         NODE* value = nullptr;
         if (entered && !sym_is_RC_in_loop(sym, entered))
             value = entry_value(sym, entered);
-        else if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, true); iv && is_affine(iv))
+        else if (const LOOPIV* iv = find_LOOPIV_for_IV(sym, loop, true);
+                 iv && is_affine(iv) && iv->incrtree->op == ICON)
             value = induction_in_term(iv);
         if (!value) return name;
         value = coerce_to_type(name->type->stqs(), value);
@@ -456,17 +537,10 @@ private:
         while (f.fixed_in->parent) f.fixed_in = f.fixed_in->parent;
         restrict_by(t, &f);
         if (is_plain_integer(t->type)) {
-            f.range = bounds_of_term(t);
+            f.range = range_of_tree(t, point.loop); // what was read ahead of a loop has the same value in it
             f.is_bounded = true;
         }
         return f;
-    }
-    // The names in a term that was read ahead of a loop have the same values in it.
-    RANGE bounds_of_term(const NODE* t) const {
-        const bool has_counts = any_subtree(t, [this](const NODE* n) {
-            return n->op == MIXVALUE || (n->op == NAME && kept.loop_counted_by(n->u.sym));
-        });
-        return has_counts ? range_of_type(t->type) : range_of_tree(t, point.loop);
     }
     void restrict_by(const NODE* t, TERM_FACTS* f) {
         for (; t && f->fixed_in; t = t->left) {
@@ -479,7 +553,8 @@ private:
             }
             if (t->op == MIXVALUE) return restrict_to(entries.loop_of(t), f);
             if (t->op == UAND && name_of_place(t->left)) return;
-            if (op_has_effect(t->op) || op_is_call(t->op) || t->op == STDOT || t->op == STREF) return restrict_to(nullptr, f);
+            if (op_has_effect(t->op) || op_is_call(t->op) || t->op == STDOT || t->op == STREF)
+                return restrict_to(nullptr, f);
             if (t->op == UMULT) {
                 const bool can_be_asked = !lvalue_is_volatile(t) && !any_subtree(t, [this](const NODE* n) {
                     return n->op == MIXVALUE || (n->op == NAME && kept.loop_counted_by(n->u.sym));
@@ -507,6 +582,7 @@ private:
     struct LOOP* loop;              // that the tree being read stands in
     struct LOOP* entered = nullptr; // it is read ahead of this one; null: at the point
     int depth = 0;
+    const TYPE* wrapping = nullptr; // operators of this unsigned type are opened whatever they give
 };
 
 // The signed number that an update adds, or nothing.
@@ -547,6 +623,7 @@ public:
     void run() {
         for (struct LOOP* l : loops_outer_first(root)) {
             kept.enter(l);
+            if (!l->is_root()) bound_trips(l);
             for (BBLK* bb : l->contents)
                 if (bb->loop == l) blocks.push_back(bb);
         }
@@ -555,6 +632,15 @@ public:
     }
 
 private:
+    // The loops around have their bounds.
+    void bound_trips(struct LOOP* loop) {
+        if (!loop->trips || loop->trips->op == ICON || !loop->trips->type->is_int()) return;
+        POINT point;
+        point.loop = loop;
+        REFERENCE scratch;
+        const WIDE most = ADDRESS_READER(&scratch, point, kept, entries).greatest_ahead(loop->trips);
+        if (most < NO_LAST) limit_trips(loop, most);
+    }
     void walk(BBLK* bb) {
         POINT point;
         point.loop = bb->loop;
@@ -591,7 +677,8 @@ private:
         if (t->op != ASG || t->left->op != NAME || p->known.size() >= MOST_KNOWN) return;
         const SYMTAB* sym = t->left->u.sym;
         if (!sym || !only_its_name_reaches(sym) || !same_numbers(t->left->type, sym->type)) return;
-        if (!same_numbers(t->right->type, sym->type) || !is_readable(t->right) || sym_appears_in_tree(sym, t->right)) return;
+        if (!same_numbers(t->right->type, sym->type) || !is_readable(t->right) || sym_appears_in_tree(sym, t->right))
+            return;
         p->known.push_back({sym, t->right});
     }
 

@@ -6,11 +6,11 @@
 // not change, or that nothing but their bounds is known of, and e runs through the differences at which two accesses
 // of their widths overlap. Values that both sides have in common cancel where they are fixed between the two.
 //
-// For each level, each distance d in its set is put to the test: with y = x + d there must be a solution by the greatest
-// common divisor of the coefficients, and by the least and the greatest value that the left side takes over the counts
-// that the loops have and the distances that the other levels still have. With one level and nothing unknown this is
-// exact: it decides equal coefficients (one distance), a coefficient of 0 on one side (one iteration), opposite ones
-// (distances of one parity) and all others alike. With more levels what one level loses narrows the next.
+// For each level, each distance d in its set is put to the test: with y = x + d there must be a solution by the
+// greatest common divisor of the coefficients, and by the least and the greatest value that the left side takes over
+// the counts that the loops have and the distances that the other levels still have. With one level and nothing unknown
+// this is exact: it decides equal coefficients (one distance), a coefficient of 0 on one side (one iteration), opposite
+// ones (distances of one parity) and all others alike. With more levels what one level loses narrows the next.
 //
 // Sound because both conditions are necessary ones of the equation over the integers, and a distance goes only where
 // they fail for every e. All of it is computed in 128 bits, in which nothing here overflows: coefficients have 33 bits,
@@ -21,17 +21,25 @@
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
-#include <array>
+#include <unordered_map>
 
 struct LOOP* loop_of_level(struct LOOP* loop, int level) {
     while (loop->level > level) loop = loop->parent;
     return loop;
 }
 
+static thread_local std::unordered_map<const struct LOOP*, WIDE> trip_limits; // looked up alone
+
+void limit_trips(const struct LOOP* loop, WIDE most) { trip_limits[loop] = most; }
+void forget_trip_limits() { trip_limits.clear(); }
+
 // The count of an iteration that is left before its tail is one more than those that are executed to their ends.
 WIDE last_iteration(const struct LOOP* loop) {
-    if (!loop->maxTrips || loop->maxTrips->op != ICON || loop->maxTrips->u.lval >= no_trip_bound()) return NO_LAST;
-    const WIDE most = to_wide(loop->maxTrips->u.lval);
+    WIDE most = NO_LAST;
+    if (loop->maxTrips && loop->maxTrips->op == ICON && loop->maxTrips->u.lval < no_trip_bound())
+        most = to_wide(loop->maxTrips->u.lval);
+    if (const auto it = trip_limits.find(loop); it != trip_limits.end()) most = std::min(most, it->second);
+    if (most >= NO_LAST) return NO_LAST;
     const bool ends_at_tail = loop->is_bottom_tested() && !loop->has(LOOP_early_exit);
     return std::max<WIDE>(0, ends_at_tail ? most - 1 : most);
 }
@@ -115,21 +123,31 @@ DISTANCES hull_of(const DVE& v) {
     return d;
 }
 
+// A value that only its bounds are known of, times a number.
+struct UNKNOWN {
+    WIDE by, low, high;
+};
+
 // The counts of one loop in the equation: a*x - b*y.
 struct LEVEL_TERM {
     WIDE a = 0, b = 0, last = NO_LAST;
     bool is_there() const { return a != 0 || b != 0; }
 
-    // Adds what it can be at these distances; false where there are no such iterations.
-    bool add_to(SPAN* s, DISTANCES d) const {
+    // Adds what it can be at these distances; false where there are no such iterations. `single`: the same term by
+    // term.
+    bool add_to(SPAN* s, DISTANCES d, std::vector<UNKNOWN>* single) const {
         if (last < FAR) d = {std::max(d.low, -last), std::min(d.high, last)};
         if (d.low > d.high) return false;
         if (!is_there()) return true;
         if (d.low == d.high) {
             s->add_constant(-b * d.low);
             s->add_multiple(a - b, first_x(d.low), last_x(d.low));
+            single->push_back({-b, d.low, d.low});
+            single->push_back({a - b, first_x(d.low), last_x(d.low)});
             return true;
         }
+        single->push_back({a, 0, last});
+        single->push_back({-b, 0, last});
         std::vector<WIDE> corners, directions;
         auto corner = [&](WIDE x, WIDE y) {
             if (y - x >= d.low && y - x <= d.high) corners.push_back(a * x - b * y);
@@ -159,15 +177,35 @@ private:
     WIDE last_x(WIDE distance) const { return last >= FAR ? FAR : distance > 0 ? last - distance : last; }
 };
 
-// A value that only its bounds are known of, times a number.
-struct UNKNOWN {
-    WIDE by, low, high;
-};
 // A value computed from counts that both sides have: of the same iterations of its loops they are equal.
 struct PAIR {
     UNKNOWN a, b;
     uint64_t levels;
 };
+
+WIDE floor_div(WIDE a, WIDE b) { // b above 0
+    const WIDE q = a / b;
+    return q - (a % b < 0 ? 1 : 0);
+}
+
+// Whether the sum of the terms, in descending order of their factors, may be `v`. Where the last terms together cannot
+// reach from one multiple of what divides the first ones to the next, the sum falls into two of their own.
+bool may_be_sum(const UNKNOWN* begin, const UNKNOWN* end, WIDE v) {
+    SPAN all, rest;
+    for (const UNKNOWN* u = begin; u != end; ++u) all.add_multiple(u->by, u->low, u->high);
+    if (!all.may_be(v)) return false;
+    for (const UNKNOWN* u = end; u - 1 > begin;) {
+        --u;
+        rest.add_multiple(u->by, u->low, u->high);
+        if (!rest.has_min || !rest.has_max) return true;
+        WIDE g = 0;
+        for (const UNKNOWN* h = begin; h != u; ++h) g = gcd_of(g, h->by);
+        const WIDE last = floor_div(v - rest.min, g) * g; // of the first terms
+        if (last < v - rest.max) return false;
+        if (last - g < v - rest.max) return may_be_sum(begin, u, last) && may_be_sum(u, end, v - last);
+    }
+    return true;
+}
 
 class EQUATION {
 public:
@@ -207,7 +245,9 @@ private:
         if (pointersAreFixed && t->type->is_pointer()) return true;
         return f.fixed_in && f.fixed_in->level <= fixed->level;
     }
-    bool is_common(const struct LOOP* l) const { return l->level <= common->level && loop_of_level(common, l->level) == l; }
+    bool is_common(const struct LOOP* l) const {
+        return l->level <= common->level && loop_of_level(common, l->level) == l;
+    }
     static UNKNOWN unknown(WIDE by, const TERM_FACTS& f) {
         if (f.counts) return {by, 0, last_iteration(f.counts)};
         return f.is_bounded ? UNKNOWN{by, f.range.min, f.range.max} : UNKNOWN{by, -FAR, FAR};
@@ -258,23 +298,40 @@ private:
     bool may_be(WIDE e, const DDEP& v, int k, DISTANCES d) const {
         SPAN s;
         s.add_constant(constant);
+        std::vector<UNKNOWN> single;
+        auto add = [&](const UNKNOWN& u) {
+            s.add_multiple(u.by, u.low, u.high);
+            single.push_back(u);
+        };
         uint64_t in_step = 0; // levels at which the iterations are the same
         for (int l = 1; l < v.count(); ++l) {
             const DISTANCES at = l == k ? d : hull_of(v.dve[static_cast<size_t>(l)]);
             if (at.is_zero()) in_step |= uint64_t(1) << l;
-            if (!levels[static_cast<size_t>(l)].add_to(&s, at)) return false;
+            if (!levels[static_cast<size_t>(l)].add_to(&s, at, &single)) return false;
         }
-        for (const UNKNOWN& u : unknowns) s.add_multiple(u.by, u.low, u.high);
+        for (const UNKNOWN& u : unknowns) add(u);
         for (const PAIR& p : pairs) {
             if (p.levels & ~in_step) {
-                s.add_multiple(p.a.by, p.a.low, p.a.high);
-                s.add_multiple(p.b.by, p.b.low, p.b.high);
+                add(p.a);
+                add(p.b);
             } else {
-                const UNKNOWN u = joined(p.a, p.b);
-                s.add_multiple(u.by, u.low, u.high);
+                add(joined(p.a, p.b));
             }
         }
-        return s.may_be(e);
+        return s.may_be(e) && (single.size() < 3 || may_be_term_by_term(&single, e - constant));
+    }
+    // Of values that are known nothing is left but their sum.
+    static bool may_be_term_by_term(std::vector<UNKNOWN>* terms, WIDE v) {
+        auto is_known = [&v](const UNKNOWN& u) {
+            if (u.by && u.low != u.high) return false;
+            v -= u.by ? u.by * u.low : 0;
+            return true;
+        };
+        terms->erase(std::remove_if(terms->begin(), terms->end(), is_known), terms->end());
+        auto size = [](WIDE w) { return w < 0 ? -w : w; };
+        std::stable_sort(terms->begin(), terms->end(),
+                         [&](const UNKNOWN& x, const UNKNOWN& y) { return size(x.by) > size(y.by); });
+        return may_be_sum(terms->data(), terms->data() + terms->size(), v);
     }
 
     bool is_concerned(int level) const {
@@ -324,7 +381,8 @@ private:
     WIDE constant = 0;
 };
 
-// The loop in which a value must be fixed to be the same for both references: outside of it the iterations are the same.
+// The loop in which a value must be fixed to be the same for both references: outside of it the iterations are the
+// same.
 struct LOOP* loop_of_differences(const DDEP& v, struct LOOP* common) {
     int level = 1;
     while (level < v.count() && v.dve[static_cast<size_t>(level)].has_only_SAME_dir()) ++level;

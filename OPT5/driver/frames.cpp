@@ -84,6 +84,10 @@ bool has_loops() {
 
 void drop_hierarchy() {
     drop_affine_marks();
+    forget_hierarchy();
+}
+
+void forget_hierarchy() {
     if (!has_hierarchy()) return;
     reinsert_loop_pragmas(currfuninfo->bb_list->loop);
     erase_loop_hierarchy();

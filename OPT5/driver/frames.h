@@ -30,3 +30,5 @@ extern register_option pass_debug_bare_SSA; // into SSA form and out of it, with
 bool has_loops(); // of the current function: a hierarchy, or edges that lead back
 // Pragmas go back to the statements, and the blocks are simplified, since no hierarchy is needed any more.
 void drop_hierarchy();
+// The same for a row that others on loops follow: what is marked in the loops stays.
+void forget_hierarchy();

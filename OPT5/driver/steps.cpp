@@ -152,7 +152,7 @@ void promote_to_registers(bool with_assertions) {
     if (pass_debug_bare_SSA)
         enter_and_leave_SSA_form(false, false, false);
     else if (promote_vars_to_registers(with_assertions))
-        drop_hierarchy();
+        forget_hierarchy();
 }
 
 template <class F>

@@ -26,7 +26,7 @@ public:
 
     void run() {
         if (n == 0) return;
-        mark_used();
+        collect();
         mark_kept();
         shorten_chains();
         extend_used();
@@ -34,15 +34,16 @@ public:
     }
 
 private:
-    void mark_used() {
+    void collect() {
         used.assign(n, false);
         used[0] = true;
         if (n > 1) used[1] = true;
         for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
             for (LIST* s = bb->statements; s; s = s->rest) collect_calls(s->first, calls);
-        for (EHT_ITEM& item : eht)
-            if (item.kind == EHK_CLEANUP) collect_calls(item.cleanup, calls);
         for (NODE* call : calls) used[call->eh_entry()] = true;
+        calls_of_cleanup.resize(n);
+        for (size_t i = 0; i < n; ++i)
+            if (eht[i].kind == EHK_CLEANUP) collect_calls(eht[i].cleanup, calls_of_cleanup[i]);
     }
 
     void mark_kept() {
@@ -73,12 +74,23 @@ private:
             call->set_eh_entry(first_kept(call->eh_entry()));
             used[call->eh_entry()] = true;
         }
+        for (const auto& of_cleanup : calls_of_cleanup)
+            for (NODE* call : of_cleanup) call->set_eh_entry(first_kept(call->eh_entry()));
     }
 
+    // From the calls of the function on: what a clean-up that none of them leads to calls reaches nothing, and a handler
+    // that it alone names has no block any more.
     void extend_used() {
-        for (size_t i = 0; i < n; ++i) {
-            if (!used[i]) continue;
-            for (uint32_t next = eht[i].next_entry; !used[next]; next = eht[next].next_entry) used[next] = true;
+        std::vector<uint32_t> waiting;
+        auto use = [this, &waiting](uint32_t id) {
+            if (!used[id]) waiting.push_back(id);
+            used[id] = true;
+        };
+        for (uint32_t i = 0; i < n; ++i)
+            if (used[i]) waiting.push_back(i);
+        for (size_t k = 0; k < waiting.size(); ++k) {
+            use(eht[waiting[k]].next_entry);
+            for (const NODE* call : calls_of_cleanup[waiting[k]]) use(call->eh_entry());
         }
     }
 
@@ -88,8 +100,9 @@ private:
         for (size_t i = 1; i < n; ++i)
             if (used[i]) new_ids[i] = ++count;
         if (count + 1 == n) return;
-        // Some stand in clean-up code that is removed.
         for (NODE* call : calls) call->set_eh_entry(new_ids[call->eh_entry()]);
+        for (const auto& of_cleanup : calls_of_cleanup) // of those that are removed too
+            for (NODE* call : of_cleanup) call->set_eh_entry(new_ids[call->eh_entry()]);
         for (size_t i = 1; i < n; ++i) {
             if (!used[i]) {
                 erase_tree(eht[i].cleanup);
@@ -108,7 +121,8 @@ private:
     std::vector<EHT_ITEM>& eht;
     const size_t n;
     std::vector<bool> used, kept;
-    std::vector<NODE*> calls;
+    std::vector<NODE*> calls;                         // of the function's statements
+    std::vector<std::vector<NODE*>> calls_of_cleanup; // by entry
 };
 
 } // namespace

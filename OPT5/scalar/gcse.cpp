@@ -210,8 +210,10 @@ bool EXPRESSION::is_placed_at_exit(const BBLK* b) const {
     return true;
 }
 
+// Not one back to the head of a loop: the loop would no longer end in its test.
 bool EXPRESSION::edge_takes_computation(const BBLK* from, const BBLK* to) {
-    return from->successors->rest && to->predecessors->rest && !tree_is_EH_SWITCH(from->branch());
+    return from->successors->rest && to->predecessors->rest && !tree_is_EH_SWITCH(from->branch()) &&
+           !currfuninfo->loops->dominates(to, from);
 }
 
 // Ahead of the control statement, which must not act then.

@@ -108,6 +108,20 @@ int critical_edges(int a, int b, int c) {
 }
 
 
+// A loop stays closed by its test: nothing is computed on the edge back.
+// FUNCTION: closed_by_its_test
+// COUNT 1: goto
+int *tab[2];
+int closed_by_its_test(int k) {
+    int i, *p = tab[1];
+    for (i = 0; i < 4; i++) {
+        hits = *tab[1];
+        *tab[1] %= k;
+        *tab[1] = k - *p;
+    }
+    return hits + *p;
+}
+
 int main(void) {
     struct S s = {1, {2, 3, 4}}, t = {5, {6, 7, 8}};
     int c;
@@ -119,6 +133,8 @@ int main(void) {
         put_i16(changes_of_memory(&s, &t, &s.b[1], c));
         s.b[1] = c;
     }
+    tab[1] = &cell;
+    put_i16(closed_by_its_test(30)); put_i16(cell);
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));
     return 0;

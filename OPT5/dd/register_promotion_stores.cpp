@@ -11,6 +11,7 @@
 // control does not come to the end of the function keeps its stores. Constant objects are not written at all.
 #include "OPT5/dd/register_promotion.h"
 
+#include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/frequencies.h"
@@ -163,10 +164,16 @@ void STORE_PROMOTER::find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& 
     std::stable_sort(all.begin(), all.end(), [](const STORED& a, const STORED& b) { return a.weight > b.weight; });
 }
 
-// The place itself, or the pointer to it.
+// The place itself, or the pointer to it. Memory without a declared type takes that of the last store: two stores stay in
+// their order whatever their types.
 bool touches(const NODE* tree, const STORED& s) {
     const NODE* place = s.c->variable->tree;
-    return tree_touches_lvalue(tree, place) || tree_modifies_lvalue_in_tree(tree, place);
+    if (tree_touches_lvalue(tree, place) || tree_modifies_lvalue_in_tree(tree, place)) return true;
+    bool writes = false;
+    for_each_write(tree, [&](const WRITE& w) {
+        writes = writes || (w.place && lvalues_may_be_aliased(access_of_place(w.place), place, nullptr, false));
+    });
+    return writes;
 }
 
 // The statements that may touch the place, in order: of an object those that name it, and those that may reach what

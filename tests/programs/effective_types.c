@@ -1,6 +1,7 @@
 // What C lets one object be accessed as: characters, the other sign, members and wholes, members of one union, memory
 // that takes a new type, pointers that are derived from a restricted one. Every store here may be seen by the load
 // behind it.
+#include <stdlib.h>
 #include <zrun.h>
 
 struct point {
@@ -120,7 +121,18 @@ static int reached_later(void) {
     return x * 10 + y;
 }
 
+// The last store of each iteration says what the memory holds behind the loop.
+static void stored_in_turn(int* p, float* q, int n) {
+    int i = 0;
+    do {
+        *p = i;
+        *q = 1.5f;
+        i++;
+    } while (i < n);
+}
+
 int main(void) {
+    void* memory = malloc(8);
     int a[4] = {1, 2, 3, 4}, spare = 0;
     put_i32(as_characters(&wide, (unsigned char*)&wide));
     put_i16(other_sign(&plain, (unsigned*)&plain));
@@ -138,5 +150,7 @@ int main(void) {
     put_i16(same_array(a, 1, 2));
     put_i16(same_array(a, 2, 1));
     put_i16(reached_later());
+    stored_in_turn(memory, memory, plain + 9);
+    put_f32(*(float*)memory);
     return 0;
 }

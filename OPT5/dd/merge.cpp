@@ -691,7 +691,7 @@ void merge_symbols() {
         debug_printf("Merging symbols for %s\n", currfunc->name);
     }
     init_skewed_offset_syms();
-    if (function_saves_environment()) return;
+    if (currfuninfo->saves_environment) return;
     need(fact::loops | fact::live_variables);
     NATURAL_LOOPS& loops = *currfuninfo->loops;
     if (currfuninfo->lva_sym_count) eliminate_single_use_temps();

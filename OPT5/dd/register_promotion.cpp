@@ -649,7 +649,7 @@ SWEEP sweep(PROMOTION_TEMPS& temps, bool with_assertions, bool is_second) {
 
 bool promote_vars_to_registers(bool with_assertions) {
     if (!currfuninfo || !currfuninfo->bb_list || !currfuninfo->stack_is_laid_out) return false;
-    if (function_saves_environment() || TEST_FLAG(currfuninfo, FUN_is_interrupt)) return false;
+    if (currfuninfo->saves_environment || TEST_FLAG(currfuninfo, FUN_is_interrupt)) return false;
     if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'promote_SSA_vars_to_registers' ------\n");
     PROMOTION_TEMPS temps;
     const SWEEP first = sweep(temps, with_assertions, false);

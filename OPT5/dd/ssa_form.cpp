@@ -413,7 +413,7 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo) {
         if (vectorsToo) debug_printf("We also consider vectors for SSA form.\n");
     }
     if (!currfuninfo->bb_list || currfuninfo->bb_list->predecessors) return;
-    if (!currfuninfo->no_calls && function_saves_environment()) return;
+    if (!currfuninfo->no_calls && currfuninfo->saves_environment) return;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         promote_toplevel_COMMAOPs_in_list(bb->statements, bb->last_statement());
     need(fact::dominators | fact::alias);

@@ -335,6 +335,8 @@ void OPT_CLIENT::cl_end_func(PSN* psn) {
     count_symbol_indexes(f);
     sym_split(f);
     check_references();
+    if (setjmp_is_named)
+        for_each_raw_tree(currfuninfo, [](const NODE* t) { currfuninfo->saves_environment |= calls_setjmp(t); });
     lex = 0;
     restate_intrinsics(f);
     simplify_raw_statements(f);

@@ -50,6 +50,8 @@ bool is_defined_here(const SYMTAB* sym) {
 
 } // namespace
 
+bool setjmp_is_named = false;
+
 // ---- Flags
 
 uint64_t get_flags(FUNINFO* f) { return f->flags; }
@@ -97,6 +99,7 @@ FUNINFO* create_funinfo(const char* name, SYMTAB* sym, int known_system) {
     init_FUNINFO_flags(f, known_system);
     fileinfo.FUNLIST.push_back(f);
     funinfo_by_name.emplace(skip_name_prefix(name), f);
+    if (!std::strcmp(skip_name_prefix(name), "setjmp")) setjmp_is_named = true;
     if (sym) sym->function_record = f;
     return f;
 }

@@ -141,6 +141,8 @@ public:
     bool address_taken_local = false, has_bitfield_access = false, has_cqual10_name = false;
     bool no_calls = true; // no CALL or UCALL was made in this function
     bool has_nasserts = false;
+    // A call of setjmp, to which control comes back from any later call: the function is worked on as at level 0.
+    bool saves_environment = false;
     bool has_affine_marks = false; // statements that say which unsigned counters do not wrap, while loops are worked on
     bool has_intrinsics = false; // a built-in was read or made; never cleared
     bool has_vector_types = false, has_complex_types = false, simd_allowed = false;
@@ -214,6 +216,7 @@ bool fun_is_cpp_constructor(const FUNINFO* f);
 bool fun_is_cpp_destructor(const FUNINFO* f);
 inline bool fun_is_cpp_op_new(const FUNINFO*) { return false; }
 bool is_system_function(const char* name);
+extern bool setjmp_is_named; // there is a record of that function
 bool func_is_nonconforming(const SYMTAB* sym);
 void add_nonconforming_function(const SYMTAB* sym);
 void init_FUNINFO_flags(FUNINFO* f, int known_system);

@@ -104,6 +104,8 @@ long number_or(int id, long absent) {
 } // namespace
 
 int opt_level() {
+    // Behind setjmp each variable has what it had at some later call: no pass knows of that.
+    if (currfuninfo && currfuninfo->saves_environment) return 0;
     switch (number_or(option_obj::OO_opt_level, -1)) {
     case 33:
     case 38: return 0;

@@ -132,6 +132,13 @@ bool tree_is_EH_SWITCH(const NODE* t) {
     return t && t->op == SWITCH && t->left && t->left->op == UMCALL && is_magic_EH_MCALL(t->left);
 }
 
+bool calls_setjmp(const NODE* t) {
+    return tree_contains_matching_node(t, [](const NODE* n) {
+        const SYMTAB* callee = op_is_call(n->op) ? get_callee_for_call(n) : nullptr;
+        return callee && !std::strcmp(skip_name_prefix(callee->name), "setjmp");
+    });
+}
+
 bool tree_is_ASM_comment(const NODE* t) {
     if (t->op != ASM) return false;
     if (t->u.lval == INT65(47) || !t->text) return true;

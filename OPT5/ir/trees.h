@@ -61,6 +61,8 @@ bool bools_are_congruent(const NODE* a, const NODE* b, bool negated, bool se_ok)
 bool tree_lists_are_congruent(const LIST* a, const LIST* b);
 bool expr_is_constant(const NODE* t);
 bool expr_is_globally_evaluable(const NODE* t);
+// Whether it saves the environment, to which control may come back later.
+bool calls_setjmp(const NODE* t);
 bool tree_is_ASM_comment(const NODE* t);
 // The call that stands for the dispatch of an exception, and the SWITCH on it, which follows a statement that may
 // throw.

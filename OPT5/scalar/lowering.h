@@ -8,9 +8,6 @@ class NODE;
 
 // Calls that the current function makes of itself as its last act become jumps to its start. Behind `buildcfg`.
 void remove_tail_recursion();
-// Whether a statement saves the environment, to which control may come back later.
-bool calls_setjmp(const NODE* tree);
-bool function_saves_environment(); // the current function, in a statement
 
 // Bit-field accesses become operations on their containers.
 void expand_bitfields();

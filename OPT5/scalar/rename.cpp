@@ -265,7 +265,7 @@ private:
 } // namespace
 
 void rename_symbols() {
-    if (!currfuninfo->bb_list || currfuninfo->bb_list->predecessors || function_saves_environment()) return;
+    if (!currfuninfo->bb_list || currfuninfo->bb_list->predecessors || currfuninfo->saves_environment) return;
     need(fact::dominators | fact::live_variables);
     if (currfuninfo->lva_sym_count) RENAMER().run();
     ::changed(fact::graph);

@@ -354,18 +354,4 @@ private:
 
 } // namespace
 
-bool calls_setjmp(const NODE* t) {
-    return tree_contains_matching_node(t, [](const NODE* n) {
-        const SYMTAB* callee = op_is_call(n->op) ? get_callee_for_call(n) : nullptr;
-        return callee && !std::strcmp(skip_name_prefix(callee->name), "setjmp");
-    });
-}
-
-bool function_saves_environment() {
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            if (calls_setjmp(s->first)) return true;
-    return false;
-}
-
 void remove_tail_recursion() { TAIL_RECURSION().run(); }

@@ -40,9 +40,10 @@ void for_each_tree(const FUNINFO* f, const F& visit) {
 // Anything but computing its value: writing, transferring control, or what is not known.
 inline bool op_has_effect(int op) { return side_effects[op] != 0; }
 inline bool op_transfers_control(int op) { return side_effects[op] == 2; }
-// Gives its left operand a value. A loop's counter is one.
+// Gives its left operand a value. A loop's counter is one; an operator of SSA form speaks of what stands below it.
 inline bool writes_left_operand(int op) {
-    return side_effects[op] == 1 || op == ARASG || op == LOOP || op == INITLOOP || op == ENDLOOP;
+    return (side_effects[op] == 1 && !(op >= SSA_PHI && op <= SSA_CHI)) || op == ARASG || op == LOOP ||
+           op == INITLOOP || op == ENDLOOP;
 }
 
 // ---- Places: what is written, or has its address taken

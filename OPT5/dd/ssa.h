@@ -88,7 +88,9 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo);
 void deconstruct_SSA_form(); // no effect out of the form
 extern bool function_is_in_SSA_form;
 
-constexpr uint32_t MOST_SSA_VARIABLES = 65535; // a function with more stays out of the form
+// A function stays out of the form if it has more tracked variables, more phis and chis than this and four for each
+// reference, or variables that are live at the start of so many blocks that finding out would take the square of its size.
+constexpr uint32_t MOST_SSA_VARIABLES = 65535, MOST_SSA_DEFINITIONS = 65535;
 
 const std::vector<std::unique_ptr<SSAVAR>>& ssa_variables();
 struct SSA_DEFINITION {

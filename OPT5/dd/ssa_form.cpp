@@ -132,12 +132,15 @@ public:
         live_at_entry.restart(build.blocks.size());
         phis.restart(build.blocks.size());
     }
-    void run() {
+    // False, with operators that have no versions, where there are too many.
+    bool run() {
         enter_uses();
         find_live_blocks();
-        place_chis();
-        place_phis();
+        if (live_left > 0) place_chis();
+        if (live_left > 0 && definitions_left > 0) place_phis();
+        if (live_left <= 0 || definitions_left <= 0) return false;
         rename();
+        return true;
     }
 
 private:
@@ -164,6 +167,9 @@ private:
     REUSED_LISTS<int>&live_in = build_lists.live_in, &definers = build_lists.definers;
     REUSED_LISTS<uint32_t>& live_at_entry = build_lists.live_at_entry;
     REUSED_LISTS<NODE*>& phis = build_lists.phis;
+    int64_t definitions_left = MOST_SSA_DEFINITIONS + 4 * static_cast<int64_t>(build.sites.size()); // chis and phis
+    int64_t live_left =
+        8 * MOST_SSA_DEFINITIONS + 32 * static_cast<int64_t>(build.sites.size()); // entries of live sets
     // While chis are placed: what is live, that which is memory as a list.
     std::vector<SSAVAR*> live_memory;
     std::vector<int32_t> place_of; // by variable: 0 dead, below 0 live, otherwise 1 + its place in `live_memory`
@@ -238,13 +244,14 @@ void BUILDER::find_live_blocks_of(SSAVAR* v, std::vector<uint32_t>& stamp) {
             state = live;
             found.push_back(from);
         }
+    live_left -= static_cast<int64_t>(found.size());
     for (int b : found) live_at_entry[static_cast<size_t>(b)].push_back(v->uid);
 }
 
 void BUILDER::find_live_blocks() {
     std::vector<uint32_t> stamp(block_count(), 0);
     for (const auto& v : variables)
-        if (!v->has(SSAVAR_munged)) find_live_blocks_of(v.get(), stamp);
+        if (live_left > 0 && !v->has(SSAVAR_munged)) find_live_blocks_of(v.get(), stamp);
 }
 
 // ---- Chis
@@ -289,7 +296,7 @@ void BUILDER::place_chis_in(size_t block, SSA_CHANGES& changes) {
             continue;
         }
         changes.of_site(site, live_memory, [&](SSAVAR* v) {
-            if (place_of[v->uid] == 0 || v->has(SSAVAR_munged)) return;
+            if (place_of[v->uid] == 0 || v->has(SSAVAR_munged) || --definitions_left <= 0) return;
             NODE* chi = new_node(SSA_CHI, (*site.link)->type);
             chi->left = *site.link;
             chi->ls = site.node->ls;
@@ -332,7 +339,7 @@ void BUILDER::place_phis() {
         for (size_t i = 0; i < waiting.size(); ++i)
             for (int join : frontiers.of(waiting[i])) {
                 const size_t b = static_cast<size_t>(join);
-                if (is_live[b] != mark || has_phi[b] == mark) continue;
+                if (is_live[b] != mark || has_phi[b] == mark || --definitions_left <= 0) continue;
                 has_phi[b] = mark;
                 waiting.push_back(join);
                 NODE* phi = new_node(SSA_PHI, v->tree->type);
@@ -426,7 +433,7 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo) {
     function_is_in_SSA_form = true;
     if (ssa_state.variables.empty() || ssa_state.variables.size() > MOST_SSA_VARIABLES) return deconstruct_SSA_form();
     mark_all_overlaps();
-    BUILDER(build).run();
+    if (!BUILDER(build).run()) return deconstruct_SSA_form();
     if (print_debug >= 3) dump_SSA_function_body();
     if (pass_debug_validate && validate_SSA_form() != 0) abort_optimizer("SSA form is not valid");
 }

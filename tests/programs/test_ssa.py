@@ -42,6 +42,17 @@ class SSA(unittest.TestCase):
                 found = re.search(rf"^{variable}\.\d+ in {head}: (.*)$", text, re.M)
                 self.assertEqual(found[1], wanted)
 
+    def test_gives_up_whole(self):
+        many = 700
+        names = ", ".join(f"g{i}" for i in range(many))
+        steps = "".join(f"if (g{i} > k) f(k - {i});\n g{i} += g{(i * 7 + 1) % many};\n" for i in range(many))
+        self.source.write_text(f"#include <zrun.h>\nint {names};\nvoid f(int k) {{ int i; if (k < 1) return;\n"
+                               f"for (i = 0; i < 2; i++) {{\n{steps}}}\n}}\n"
+                               "int main(void) { g1 = 1; f(2); put_i16(g0 + g3 + g699); return 0; }\n")
+        self.tools.parse(self.source, self.unit)
+        self.tools.optimize(self.unit, self.out, ["--opt_level=2", "--debug:validate"])
+        self.assertEqual(difference(self.tools.execute(self.unit), self.tools.execute(self.out)), None)
+
     def test_leaves_no_trace(self):
         for program in sorted(ROOT.glob("bench/kernels/*.c")):
             with self.subTest(program.name):

@@ -11,7 +11,8 @@
 // Edges that exceptions take, and those out of a block that ends in their dispatch, get no computation.
 //
 // Every expression is looked at by itself, in the blocks that it reaches: sets of all expressions for all blocks would
-// take the square of the function's size.
+// take the square of the function's size. What a block does to an expression is asked when it is reached, and the number
+// of blocks that all expressions may reach is limited, so that time stays linear.
 //
 // Sources: E. Morel, C. Renvoise, "Global Optimization by Suppression of Partial Redundancies", 1979; D. M. Dhamdhere,
 // "Practical Adaptation of the Global Optimization Algorithm of Morel and Renvoise", 1991 (insertion on edges).
@@ -50,6 +51,7 @@ enum FACT_BIT : uint16_t {
     NEEDED = 128, // the temporary's value is needed at the exit
     SEEN = 256,
     EXPOSED = 512, // as ANTLOC, whether or not control passes through
+    REACHED = 1024,
 };
 
 class EXPRESSION {
@@ -58,16 +60,14 @@ public:
     struct FUNCTION {
         std::vector<BBLK*> blocks;   // by number
         std::vector<uint16_t> facts; // by block; 0 between expressions
-        std::vector<int> endless;    // blocks from which control reaches no end of the function
+        std::vector<bool> is_endless; // by block: control reaches no end of the function from there
         FREQUENCIES runs;
-        int64_t questions_left = 100000; // about writes to memory
+        int64_t questions_left = 100000; // about writes to memory; beyond them every write is taken to change it
+        int64_t blocks_left = 4000000;   // to be reached; beyond them expressions stay where they are
     };
     EXPRESSION(const TRIPLE& t, FUNCTION& function)
-        : t(t), facts(function.facts), blocks(function.blocks), endless(function.endless), runs(function.runs),
-          questions_left(function.questions_left) {}
-    ~EXPRESSION() {
-        for (int b : touched) facts[static_cast<size_t>(b)] = 0;
-    }
+        : t(t), facts(function.facts), blocks(function.blocks), function(function) {}
+    ~EXPRESSION() { forget(); }
     // Whether it pays; fills what is to be done.
     bool decide();
 
@@ -80,19 +80,28 @@ public:
     std::vector<const TRIPLE_SITE*> save;    // computed into the temporary
 
 private:
+    // The first and last change in a block, by position; 0: there is none.
+    struct CHANGES {
+        int first = 0, last = 0;
+    };
     uint16_t& at(int block) {
         uint16_t& f = facts[static_cast<size_t>(block)];
-        if (f == 0) touched.push_back(block);
+        if (f == 0) reach(block, first_change(block));
         return f;
     }
-    uint16_t at(const BBLK* bb) const { return facts[static_cast<size_t>(bb->dfn)]; }
+    uint16_t& at(const BBLK* bb) { return at(bb->dfn); }
+    void reach(int block, int change);
+    void forget();
+    int first_change(int block);
+    int last_change(int block);
+    bool changes_it(const TRIPLE_WRITE& w);
     BBLK* bb(int block) const { return blocks[static_cast<size_t>(block)]; }
-    bool is_available_at_exit(const BBLK* b) const {
+    bool is_available_at_exit(const BBLK* b) {
         const uint16_t f = at(b);
         return (f & AVLOC) || ((f & AVIN) && !(f & ALTERED));
     }
-    bool is_placed_at_exit(const BBLK* b) const;
-    bool is_placed_through(const BBLK* b) const { return (at(b) & PPIN) && !(at(b) & (ALTERED | STAYS)); }
+    bool is_placed_at_exit(const BBLK* b);
+    bool is_placed_through(const BBLK* b) { return (at(b) & PPIN) && !(at(b) & (ALTERED | STAYS)); }
     bool is_redundant_in(int block) {
         const uint16_t f = at(block);
         return (f & (ANTLOC | PPIN)) == (ANTLOC | PPIN) || (f & (EXPOSED | AVIN)) == (EXPOSED | AVIN);
@@ -100,71 +109,105 @@ private:
     static bool edge_takes_computation(const BBLK* from, const BBLK* to);
     static bool end_takes_computation(const BBLK* b);
 
-    void find_local_facts(bool with_memory);
-    void enter_changes(const std::vector<TRIPLE_WRITE>& writes, uint16_t bit);
-    void enter_memory_changes();
+    void find_local_facts();
     void find_partial_availability();
     bool may_be_redundant();
     void find_availability();
     void find_placement();
-    bool may_be_placed(const BBLK* b) const;
+    bool may_be_placed(const BBLK* b);
     void find_insertions();
     void find_saves();
     bool pays() const;
 
-    // The first and last change in a block, by position.
-    struct CHANGES {
-        int first = 0, last = 0, first_stay = 0;
-    };
     const TRIPLE& t;
     std::vector<uint16_t>& facts; // by block; 0 but for what `touched` lists
     const std::vector<BBLK*>& blocks;
-    const std::vector<int>& endless;
-    const FREQUENCIES& runs;
-    int64_t& questions_left;
+    FUNCTION& function;
+    bool with_memory = false; // writes to memory count
     std::vector<int> touched, region;
-    std::unordered_map<int, CHANGES> changes; // by block; looked up alone
+    std::unordered_map<int, CHANGES> changes; // of the blocks of its sites; looked up alone
 };
 
-void EXPRESSION::enter_changes(const std::vector<TRIPLE_WRITE>& writes, uint16_t bit) {
-    for (const TRIPLE_WRITE& w : writes) {
-        at(w.block) |= bit;
-        CHANGES& c = changes[w.block];
-        if (bit == STAYS) {
-            if (!c.first_stay || w.position < c.first_stay) c.first_stay = w.position;
-            continue;
-        }
-        if (!c.first || w.position < c.first) c.first = w.position;
-        c.last = std::max(c.last, w.position);
+// Those of one block. Writes are in the order of blocks and statements.
+std::pair<const TRIPLE_WRITE*, const TRIPLE_WRITE*> in_block(const std::vector<TRIPLE_WRITE>& writes, int block) {
+    const TRIPLE_WRITE *begin = writes.data(), *end = begin + writes.size();
+    begin = std::lower_bound(begin, end, block, [](const TRIPLE_WRITE& w, int b) { return w.block < b; });
+    return {begin, std::upper_bound(begin, end, block, [](int b, const TRIPLE_WRITE& w) { return b < w.block; })};
+}
+
+bool EXPRESSION::changes_it(const TRIPLE_WRITE& w) {
+    return --function.questions_left < 0 || tree_modifies_lvalue_in_tree(w.statement, t.tree);
+}
+
+int EXPRESSION::first_change(int block) {
+    int first = 0;
+    auto enter = [&first](int position) {
+        if (!first || position < first) first = position;
+    };
+    for (const SYMTAB* sym : t.variables) {
+        const auto [begin, end] = in_block(writes_of_variable(sym), block);
+        if (begin != end) enter(begin->position);
     }
+    if (!with_memory) return first;
+    const auto [begin, end] = in_block(writes_of_memory(), block);
+    for (const TRIPLE_WRITE* w = begin; w != end && (!first || w->position < first); ++w)
+        if (changes_it(*w)) enter(w->position);
+    return first;
 }
 
-// Beyond a number of questions every write is taken to change it: time stays linear.
-void EXPRESSION::enter_memory_changes() {
-    std::vector<TRIPLE_WRITE> changing;
-    for (const TRIPLE_WRITE& w : writes_of_memory())
-        if (--questions_left < 0 || tree_modifies_lvalue_in_tree(w.statement, t.tree)) changing.push_back(w);
-    enter_changes(changing, ALTERED);
+int EXPRESSION::last_change(int block) {
+    int last = 0;
+    for (const SYMTAB* sym : t.variables) {
+        const auto [begin, end] = in_block(writes_of_variable(sym), block);
+        if (begin != end) last = std::max(last, end[-1].position);
+    }
+    if (!with_memory) return last;
+    const auto [begin, end] = in_block(writes_of_memory(), block);
+    for (const TRIPLE_WRITE* w = end; w != begin && w[-1].position > last; --w)
+        if (changes_it(w[-1])) last = w[-1].position;
+    return last;
 }
 
-void EXPRESSION::find_local_facts(bool with_memory) {
+void EXPRESSION::reach(int block, int change) {
+    --function.blocks_left;
+    uint16_t f = REACHED;
+    if (change) f |= ALTERED;
+    if (t.may_trap) {
+        const auto [begin, end] = in_block(statements_that_may_stay(), block);
+        if (begin != end || function.is_endless[static_cast<size_t>(block)]) f |= STAYS;
+    }
+    facts[static_cast<size_t>(block)] = f;
+    touched.push_back(block);
+}
+
+void EXPRESSION::forget() {
     for (int b : touched) facts[static_cast<size_t>(b)] = 0;
     touched.clear();
     region.clear();
     changes.clear();
-    for (const SYMTAB* sym : t.variables) enter_changes(writes_of_variable(sym), ALTERED);
-    if (with_memory) enter_memory_changes();
-    if (t.may_trap) {
-        enter_changes(statements_that_may_stay(), STAYS);
-        for (int b : endless) at(b) |= STAYS;
-    }
-    for (const TRIPLE_SITE& site : t.sites) {
-        auto found = changes.find(site.block);
-        const CHANGES c = found == changes.end() ? CHANGES() : found->second;
-        const bool is_ahead_of_stay = !c.first_stay || site.position <= c.first_stay;
-        if (!c.first || site.position <= c.first)
-            at(site.block) |= site.is_certain && is_ahead_of_stay ? ANTLOC | EXPOSED : EXPOSED;
-        if (site.is_certain && site.position > c.last) at(site.block) |= AVLOC;
+}
+
+void EXPRESSION::find_local_facts() {
+    forget();
+    for (size_t i = 0; i < t.sites.size();) {
+        const int block = t.sites[i].block;
+        CHANGES c;
+        c.first = first_change(block);
+        if (c.first) c.last = std::max(c.first, last_change(block));
+        if (c.first) changes[block] = c;
+        reach(block, c.first);
+        int first_stay = 0;
+        if (at(block) & STAYS) {
+            const auto [begin, end] = in_block(statements_that_may_stay(), block);
+            if (begin != end) first_stay = begin->position;
+        }
+        for (; i < t.sites.size() && t.sites[i].block == block; ++i) {
+            const TRIPLE_SITE& site = t.sites[i];
+            const bool is_ahead_of_stay = !first_stay || site.position <= first_stay;
+            if (!c.first || site.position <= c.first)
+                at(block) |= site.is_certain && is_ahead_of_stay ? ANTLOC | EXPOSED : EXPOSED;
+            if (site.is_certain && site.position > c.last) at(block) |= AVLOC;
+        }
     }
 }
 
@@ -181,7 +224,7 @@ void EXPRESSION::find_partial_availability() {
     };
     for (const TRIPLE_SITE& site : t.sites)
         if (at(site.block) & AVLOC) enter_successors(site.bb);
-    while (!waiting.empty()) {
+    while (!waiting.empty() && function.blocks_left >= 0) {
         const BBLK* b = waiting.back();
         waiting.pop_back();
         enter_successors(b);
@@ -203,7 +246,7 @@ void EXPRESSION::find_availability() {
     }
 }
 
-bool EXPRESSION::is_placed_at_exit(const BBLK* b) const {
+bool EXPRESSION::is_placed_at_exit(const BBLK* b) {
     if (!b->successors) return false;
     for (const EDGE* s = b->successors; s; s = s->rest)
         if (!(at(s->first) & PPIN)) return false;
@@ -221,7 +264,7 @@ bool EXPRESSION::end_takes_computation(const BBLK* b) {
     return !tree_is_EH_SWITCH(b->branch()) && !tree_has_side_effects(b->branch()->left);
 }
 
-bool EXPRESSION::may_be_placed(const BBLK* b) const {
+bool EXPRESSION::may_be_placed(const BBLK* b) {
     const uint16_t f = at(b);
     if (b == currfuninfo->bb_list) return false;
     if (!(f & ANTLOC) && ((f & (ALTERED | STAYS)) || !is_placed_at_exit(b))) return false;
@@ -312,26 +355,26 @@ void EXPRESSION::find_saves() {
 bool EXPRESSION::pays() const {
     const double cost = t.cost;
     double gain = 0;
-    for (const TRIPLE_SITE* site : replace) gain += (site->is_certain ? cost : cost / 2) * runs.of(site->bb);
-    for (const TRIPLE_SITE* site : save) gain -= runs.of(site->bb);
-    for (const BBLK* b : insert_at_end) gain -= (cost + 1) * runs.of(b);
-    for (const EDGE_PLACE& e : insert_on_edge) gain -= (cost + 1) * runs.of_edge(e.from, e.to);
+    for (const TRIPLE_SITE* site : replace) gain += (site->is_certain ? cost : cost / 2) * function.runs.of(site->bb);
+    for (const TRIPLE_SITE* site : save) gain -= function.runs.of(site->bb);
+    for (const BBLK* b : insert_at_end) gain -= (cost + 1) * function.runs.of(b);
+    for (const EDGE_PLACE& e : insert_on_edge) gain -= (cost + 1) * function.runs.of_edge(e.from, e.to);
     if (size_speed_goal() < 2 && insert_at_end.size() + insert_on_edge.size() >= replace.size()) return false;
     return gain > 1e-6;
 }
 
 bool EXPRESSION::may_be_redundant() {
+    find_local_facts();
     find_partial_availability();
-    return std::any_of(t.sites.begin(), t.sites.end(), [this](const TRIPLE_SITE& site) {
+    return function.blocks_left >= 0 && std::any_of(t.sites.begin(), t.sites.end(), [this](const TRIPLE_SITE& site) {
         return (at(site.block) & (EXPOSED | PAVIN)) == (EXPOSED | PAVIN);
     });
 }
 
 bool EXPRESSION::decide() {
-    find_local_facts(false);
     if (!may_be_redundant()) return false;
     if (t.reads_memory) {
-        find_local_facts(true);
+        with_memory = true;
         if (!may_be_redundant()) return false;
     }
     find_availability();
@@ -349,6 +392,7 @@ public:
 
 private:
     void find_blocks();
+    void find_steps();
     void keep_what_stands(TRIPLE& t);
     bool is_worth_a_look(const TRIPLE& t) const;
     bool is_induction(const TRIPLE& t) const;
@@ -360,6 +404,8 @@ private:
     std::vector<NODE*> taken_away;        // erased at the end: they hold slots of other expressions
     STATEMENTS_AHEAD ahead;
     std::map<std::pair<int, int>, std::vector<NODE*>> on_edges; // by the numbers of the blocks
+    // Outermost loops that step a variable; membership only.
+    std::unordered_map<const SYMTAB*, std::unordered_set<const NATURAL_LOOP*>> stepped_in;
     int applied = 0;
 };
 
@@ -384,8 +430,8 @@ void GLOBAL_CSE::find_blocks() {
             waiting.push_back(p->first);
         }
     }
-    for (size_t b = 1; b < count; ++b)
-        if (!ends[b]) function.endless.push_back(static_cast<int>(b));
+    function.is_endless = std::move(ends);
+    function.is_endless.flip();
 }
 
 // Sites within what another expression took away are none any more.
@@ -427,21 +473,33 @@ bool is_linear(const NODE* t) {
     });
 }
 
+const NATURAL_LOOP* outermost_loop_around(const BBLK* bb) {
+    const NATURAL_LOOP* loop = currfuninfo->loops->around(bb);
+    while (loop && loop->parent) loop = loop->parent;
+    return loop;
+}
+
+void GLOBAL_CSE::find_steps() {
+    for (const TRIPLE& t : unique_triples)
+        for (const SYMTAB* x : t.variables) {
+            auto [at, is_new] = stepped_in.try_emplace(x);
+            if (!is_new) continue;
+            for (const TRIPLE_WRITE& w : writes_of_variable(x)) {
+                const NATURAL_LOOP* loop = outermost_loop_around(function.blocks[static_cast<size_t>(w.block)]);
+                if (loop && is_step(w.statement, x)) at->second.insert(loop);
+            }
+        }
+}
+
 // A linear expression of a loop's counters is made a counter itself later on, which a temporary of its parts would
 // hide.
 bool GLOBAL_CSE::is_induction(const TRIPLE& t) const {
     if (!is_linear(t.tree)) return false;
-    for (const TRIPLE_SITE& site : t.sites) {
-        const NATURAL_LOOP* loop = currfuninfo->loops->around(site.bb);
-        while (loop && loop->parent) loop = loop->parent;
-        if (!loop) continue;
-        for (const SYMTAB* x : t.variables)
-            for (const TRIPLE_WRITE& w : writes_of_variable(x))
-                if (is_step(w.statement, x) &&
-                    currfuninfo->loops->contains(loop, function.blocks[static_cast<size_t>(w.block)]))
-                    return true;
-    }
-    return false;
+    return std::any_of(t.sites.begin(), t.sites.end(), [&](const TRIPLE_SITE& site) {
+        const NATURAL_LOOP* loop = outermost_loop_around(site.bb);
+        return loop && std::any_of(t.variables.begin(), t.variables.end(),
+                                   [&](const SYMTAB* x) { return stepped_in.at(x).count(loop) != 0; });
+    });
 }
 
 void GLOBAL_CSE::apply(const EXPRESSION& e, const TRIPLE& t) {
@@ -491,7 +549,11 @@ void GLOBAL_CSE::run() {
     // A tree ahead of what it consists of.
     std::stable_sort(order.begin(), order.end(),
                      [](size_t a, size_t b) { return unique_triples[a].cost > unique_triples[b].cost; });
-    for (const TRIPLE& t : unique_triples) function.questions_left += 64 * static_cast<int64_t>(t.sites.size());
+    for (const TRIPLE& t : unique_triples) {
+        function.questions_left += 64 * static_cast<int64_t>(t.sites.size());
+        function.blocks_left += 256 * static_cast<int64_t>(t.sites.size());
+    }
+    find_steps();
     for (size_t i : order) {
         TRIPLE& t = unique_triples[i];
         keep_what_stands(t);

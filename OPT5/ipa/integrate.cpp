@@ -304,9 +304,10 @@ void INTEGRATION::end_returns(const CFG_COPY& copy, BBLK* following, SYMTAB* res
 
 // ---- Arguments
 
-// The NAME of a parameter that an assignment of the prolog copies, through its casts.
+// The NAME of a parameter that an assignment of the prolog copies, through its casts. A list that begins a function may
+// hold other trees too.
 NODE** parameter_in(NODE* asg) {
-    OPT_ASSERT(asg->op == ASG || asg->op == STASG);
+    if (asg->op != ASG && asg->op != STASG) return nullptr;
     NODE** slot = &asg->right;
     while ((*slot)->op == SCONV || (*slot)->op == PCONV || (*slot)->op == ISP2CHAR) slot = &(*slot)->left;
     return (*slot)->op == NAME ? slot : nullptr;
@@ -364,22 +365,23 @@ void INTEGRATION::bind_arguments(NODE* call, const CFG_COPY& copy, const FUNINFO
         drop_statement(&copy.first->statements);
     }
     std::unordered_map<const SYMTAB*, int> reads; // by the prolog; many where the body reads it
-    for (BBLK* bb = copy.first;; bb = bb->dflink) {
-        for (LIST* s = bb->statements; s; s = s->rest)
-            for_each_subtree(s->first, [&reads](const NODE* t) {
-                if (t->op == NAME) reads[t->u.sym] += 2;
-            });
-        if (bb == copy.last) break;
-    }
-    for (const EHT_ITEM& item : currfuninfo->eht)
-        for_each_subtree(static_cast<const NODE*>(item.cleanup), [&reads](const NODE* t) {
+    auto enter_reads = [&reads](const NODE* tree) {
+        for_each_subtree(tree, [&reads](const NODE* t) {
             if (t->op == NAME) reads[t->u.sym] += 2;
         });
+    };
+    for (BBLK* bb = copy.first;; bb = bb->dflink) {
+        for (LIST* s = bb->statements; s; s = s->rest) enter_reads(s->first);
+        if (bb == copy.last) break;
+    }
+    for (const EHT_ITEM& item : currfuninfo->eht) enter_reads(item.cleanup);
     std::unordered_map<const SYMTAB*, NODE**> place;
     for (NODE* asg : prolog)
         if (NODE** slot = parameter_in(asg)) {
             ++reads[(*slot)->u.sym];
             place[(*slot)->u.sym] = slot;
+        } else {
+            enter_reads(asg);
         }
     const std::vector<SYMTAB*> parameters = parameters_of(body, copy);
     for (size_t i = 0; i < arguments.size(); ++i) {

@@ -186,4 +186,23 @@ TEST_F(ProgramTest, AFunctionThatOnlyPassesItsParametersOnIsASynonym) {
     EXPECT_NE(dump().find("FUNC_SYNONYM"), std::string::npos) << dump();
 }
 
+// A list that begins a function need not copy its parameters: what else it reads of them is read where it stands.
+TEST_F(ProgramTest, AListThatBeginsAFunctionMayHoldAnyTree) {
+    IC_SYMBOL* total = global("_total", pkg.int_t, 2);
+    IC_SYMBOL* f = global("_f", function_type({pkg.int_t, pkg.int_t}, pkg.int_t), 3);
+    begin(f);
+    IC_SYMBOL *a = local("a", pkg.int_t, 17), *b = local("b", pkg.int_t, 17);
+    end_args();
+    IC_SYMBOL* b2 = local("b", pkg.int_t);
+    end_locals();
+    statement(node(op::PCOMMA, pkg.void_t, node(op::PLUSASG, pkg.int_t, name(total), name(a)),
+                   node(op::ASG, pkg.int_t, name(b2), name(b))));
+    statement(node(op::RETURN, pkg.int_t, name(f), name(b2)));
+    end();
+    begin_main();
+    ret(call(f, node(op::COMMA, pkg.int_t, icon(3), icon(4))));
+    end();
+    EXPECT_NE(optimized({"--opt_level=3"}).find("\n_total += 3\n"), std::string::npos) << dump();
+}
+
 } // namespace

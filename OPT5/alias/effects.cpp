@@ -121,13 +121,13 @@ bool place_may_meet(const NODE* place, const NODE* lvalue) {
     return meets;
 }
 
-// One node of a tree, its operands aside.
-bool node_may_modify(const NODE* t, const NODE* lvalue) {
+// One node of a tree, its operands aside. `is_volatile`: the lvalue is.
+bool node_may_modify(const NODE* t, const NODE* lvalue, bool is_volatile) {
     if (writes_left_operand(t->op)) return !t->left || place_may_meet(t->left, lvalue);
     if (is_operation_on_memory(t->op)) return call_may_modify(t, lvalue);
     if (t->op == ASM) return asm_may_access(t, lvalue);
     // A volatile access is an event, that keeps its order to other events.
-    if (is_lvalue(t) && lvalue_is_volatile(t)) return lvalue_is_volatile(lvalue);
+    if (is_lvalue(t)) return is_volatile && lvalue_is_volatile(t);
     return op_has_effect(t->op) && !op_transfers_control(t->op) && !is_inert(t->op);
 }
 
@@ -198,7 +198,8 @@ bool tree_acts(const NODE* tree) {
 }
 
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
-    return any_subtree(a, [lvalue](const NODE* t) { return node_may_modify(t, lvalue); });
+    const bool is_volatile = lvalue_is_volatile(lvalue);
+    return any_subtree(a, [=](const NODE* t) { return node_may_modify(t, lvalue, is_volatile); });
 }
 
 bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {

@@ -58,6 +58,7 @@ struct SUMMARY {
     const SSAVAR* stored = nullptr;    // which this is of
     bool is_barrier = false;           // for all
     bool is_indirect = false;          // accesses something through a pointer, or may
+    bool is_memory = false;            // names what pointers may reach
 };
 
 class STORE_PROMOTER {
@@ -96,6 +97,7 @@ private:
     const FREQUENCIES frequencies;
     std::vector<SUMMARY> statements;
     std::vector<size_t> indirect; // those that may touch what they do not name
+    std::vector<size_t> memory;   // those that may touch what pointers reach
     std::unordered_map<const SYMTAB*, std::vector<size_t>> naming; // statements by symbol; looked up, never walked
     std::vector<STORED> all;
     std::vector<STORED*> batch;
@@ -120,6 +122,7 @@ SUMMARY STORE_PROMOTER::summary_of(LIST* cell, size_t block) {
         if (n->op == NAME && n->u.sym) {
             std::vector<size_t>& in = naming[n->u.sym];
             if (in.empty() || in.back() != statements.size()) in.push_back(statements.size());
+            s.is_memory |= !n->u.sym->is_function() && !only_its_name_reaches(n->u.sym);
         }
         s.is_indirect |= n->op == UMULT || n->op == STREF || op_is_intrinsic(n->op);
     });
@@ -133,6 +136,8 @@ void STORE_PROMOTER::summarize() {
     questions_left = MOST_QUESTIONS + 8 * static_cast<int64_t>(statements.size());
     for (size_t i = 0; i < statements.size(); ++i)
         if (statements[i].is_barrier || statements[i].is_indirect) indirect.push_back(i);
+    for (size_t i = 0; i < statements.size(); ++i)
+        if (statements[i].is_barrier || statements[i].is_indirect || statements[i].is_memory) memory.push_back(i);
 }
 
 bool may_be_stored_to(const CANDIDATE& c) {
@@ -176,18 +181,14 @@ bool touches(const NODE* tree, const STORED& s) {
     return writes;
 }
 
-// The statements that may touch the place, in order: of an object those that name it, and those that may reach what
-// they do not name.
+// The statements that may touch the place or the pointer to it, in order: those that name it, and those that may reach
+// what they do not name.
 std::vector<size_t> STORE_PROMOTER::statements_around(const SSAVAR* v) const {
+    const std::vector<size_t>& others = v->pointer ? memory : indirect;
+    auto at = naming.find(v->base());
+    if (at == naming.end()) return others;
     std::vector<size_t> found;
-    if (v->pointer) {
-        found.resize(statements.size());
-        std::iota(found.begin(), found.end(), size_t(0));
-        return found;
-    }
-    auto at = naming.find(v->sym);
-    if (at != naming.end())
-        std::set_union(at->second.begin(), at->second.end(), indirect.begin(), indirect.end(), std::back_inserter(found));
+    std::set_union(at->second.begin(), at->second.end(), others.begin(), others.end(), std::back_inserter(found));
     return found;
 }
 

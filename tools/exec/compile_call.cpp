@@ -91,6 +91,7 @@ const XNODE* COMPILER::call(const IC_NODE* n) {
     CALL_SITE& site = *p.make<CALL_SITE>();
     site.result = shape_of(n->type);
     site.eh_entry = n->number2;
+    if (site.eh_entry) f->handled_calls.emplace_back(static_cast<uint32_t>(f->code.size()) - 1, site.eh_entry);
     const IC_NODE* callee = strip_marks(n->left);
     const IC_NODE* named = callee->op == op::UAND ? strip_marks(callee->left) : callee;
     auto entry = named->op == op::NAME && named->sym ? p.entries.find(named->sym) : p.entries.end();

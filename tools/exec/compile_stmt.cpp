@@ -190,6 +190,7 @@ uint32_t COMPILER::target(uint32_t label) {
 
 void COMPILER::exceptions(const IC_ITEM& item) {
     f->handling.resize(size_t(item.number) + 1);
+    const size_t calls_of_statements = f->handled_calls.size();
     for (uint32_t i = 0; i < item.number; ++i) {
         const EHT_ENTRY& entry = item.eht[i];
         HANDLING& h = f->handling.at(entry.id);
@@ -198,6 +199,7 @@ void COMPILER::exceptions(const IC_ITEM& item) {
         if (entry.cleanup) h.cleanup = value(static_cast<const IC_NODE*>(entry.cleanup));
         for (const I_CATCH_ENTRY& c : entry.catches) h.clauses.emplace_back(c.type_name, target(c.label));
     }
+    f->handled_calls.resize(calls_of_statements);
 }
 
 // Labels are known now: branches and switches get their targets.

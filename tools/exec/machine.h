@@ -127,6 +127,7 @@ struct FUNCTION {
     bool variadic = false;
     std::vector<TRIP_PROMISE> promises; // of a checked run
     std::vector<HANDLING> handling;     // the exception table, the root first; empty without one
+    std::vector<std::pair<uint32_t, uint32_t>> handled_calls; // their statements, and their exception entries
     std::vector<LOOP_RECORD> loops;     // of one as well
     std::vector<uint32_t> loop_of;      // the id of the innermost loop around each statement, or NO_LOOP
     std::shared_ptr<DEPENDENCES> dependences; // of a checked run with numbered accesses

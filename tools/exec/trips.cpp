@@ -28,18 +28,25 @@ void spread(const std::vector<TARGETS>& edges, TARGETS work, uint32_t wall, std:
 
 class LOOP_FINDER {
 public:
-    explicit LOOP_FINDER(const std::vector<STMT>& code) : code_m(code), next_m(code.size()), before_m(code.size()) {
+    explicit LOOP_FINDER(const FUNCTION& f) : code_m(f.code), next_m(code_m.size()), before_m(code_m.size()) {
+        const std::vector<STMT>& code = f.code;
         for (uint32_t at = 0; at < code.size(); at++) {
             next_m[at] = successors(code, at);
             for (uint32_t to : next_m[at])
                 if (to < code.size()) before_m[to].push_back(at);
         }
+        next_or_handlers_m = next_m;
+        for (auto [at, entry] : f.handled_calls)
+            for (size_t steps = 0; entry && entry < f.handling.size() && steps < f.handling.size(); steps++) {
+                for (const auto& clause : f.handling[entry].clauses) next_or_handlers_m[at].push_back(clause.second);
+                entry = f.handling[entry].next;
+            }
     }
     bool find(TRIP_PROMISE& p) {
         if (p.head >= code_m.size()) return false;
         if (p.is_record) return find_tail(p);
         std::vector<uint8_t> beside(code_m.size());
-        spread(next_m, {0}, p.head, beside);
+        spread(next_or_handlers_m, {0}, p.head, beside);
         TARGETS sources;
         for (uint32_t from : before_m[p.head])
             if (!beside[from]) sources.push_back(from);
@@ -56,6 +63,7 @@ public:
 private:
     const std::vector<STMT>& code_m;
     std::vector<TARGETS> next_m, before_m;
+    std::vector<TARGETS> next_or_handlers_m; // where an exception that leaves a call may lead, too
 
     // Of a record, whose roles tell what is in the loop: exits are told apart by the tail.
     bool find_tail(TRIP_PROMISE& p) const {
@@ -189,7 +197,7 @@ std::string bind_loop_records(FUNCTION& f) {
 
 void find_promised_loops(FUNCTION& f) {
     if (f.promises.empty()) return;
-    LOOP_FINDER finder(f.code);
+    LOOP_FINDER finder(f);
     std::vector<TRIP_PROMISE> found;
     for (TRIP_PROMISE& p : f.promises)
         if (finder.find(p)) found.push_back(std::move(p));

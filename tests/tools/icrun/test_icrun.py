@@ -116,6 +116,16 @@ class Files(unittest.TestCase):
         self.assertRegex(done.stderr, r"(?m)^loops 2 loops_closed 1 iterations 22 iterations_closed 4 loop_branches 43 "
                                       r"tested_loops 1 tested_iterations 9 ")
 
+    def test_promise_in_a_handler(self):
+        """No edge of the code leads to the handler: what stands ahead of its loop is no part of that."""
+        source = """#include <zrun.h>
+            int main(void) { int i, s = 0;
+            __eh_catch("...", h); zthrow(2); __eh_end(); return 1;
+            h: _Pragma("MUST_ITERATE(3, 3)") for (i = 0; i < N; i++) s += i;
+            return s; }"""
+        self.assertEqual(icrun("--check", self.compiled(source.replace("N", "3"))).returncode, 3)
+        self.assertEqual(icrun("--check", self.compiled(source.replace("N", "4"))).returncode, 76)
+
 
 if __name__ == "__main__":
     unittest.main()

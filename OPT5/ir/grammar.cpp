@@ -281,7 +281,8 @@ void check_assignment(const NODE* t) {
     if (t->op == STASG || t->op == ARASG) return;
     check_type(t, t, same_kind(t->type, to) || t->type->is_void());
     check_type(t->right, t, is_operand_type(from) == is_operand_type(to));
-    check_type(t->right, t, !(from->is_pointer() && to->is_complex()) && !(from->is_complex() && to->is_pointer()));
+    check_type(t->right, t, !(from->is_pointer() && to->is_complex()));
+    check_type(t->right, t, !from->is_complex() || to->is_complex() || !to->is_scalar());
 }
 
 void check_types(const NODE* t) {

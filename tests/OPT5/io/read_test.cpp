@@ -254,6 +254,8 @@ TEST(Shapes, OperatorsHaveOperandsThatTheyCanComputeWith) {
         {op::EQ, "complex", "int", "int", "EQ of type complex float"},
         {op::LT, "int", "complex", "int", "LT of what has type complex float"},
         {op::ASG, "complex", "complex", "int", ""},
+        {op::ASG, "int", "int", "complex", "ASG of what has type complex float"},
+        {op::PLUSASG, "int", "int", "complex", "PLUSASG of what has type complex float"},
         {op::ASG, "complex", "complex", "pointer", "ASG of what has type int *"},
         {op::ASG, "int", "", "int", "ASG to what is no place"},
     };

@@ -109,8 +109,8 @@ std::string text_of_operators(NODE* tree) {
 }
 
 void dump_variable(const SSAVAR* v) {
-    debug_printf("SSAVAR %s entry #%u: %s [%s;%s]", v->sym ? "DIRECT" : "INDIRECT", v->uid,
-                 tree_to_infix(v->tree).c_str(), int2text(v->start, tp->llong_t, 10, 0),
+    debug_printf(v->sym ? "SSAVAR DIRECT entry #%u" : "SSAVAR INDIRECT entry #%u", v->uid);
+    debug_printf(": %s [%s;%s]", tree_to_infix(v->tree).c_str(), int2text(v->start, tp->llong_t, 10, 0),
                  int2text(v->length, tp->llong_t, 10, 1));
     static const char* const names[] = {"entire_object",   "fixed_address", "DEFd",     "USEd",   "aliased", "array",
                                         "likely_register", "global",        "multi_bb", "munged", "unioned"};

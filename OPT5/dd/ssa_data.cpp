@@ -160,7 +160,7 @@ public:
     void classify();
 
 private:
-    bool is_member(const SSADATA* d) const { return d && d->has(SSADATA_visited); }
+    bool is_member(const SSADATA* d) const { return d && d->is_visited(); }
     STEP step_to(SSADATA* d, int depth);
     STEP find_step(SSADATA* d, int depth);
     STEP step_of_phi(SSADATA* d, int depth);
@@ -201,7 +201,7 @@ STEP REGION::step_to(SSADATA* d, int depth) {
 }
 
 STEP REGION::find_step(SSADATA* d, int depth) {
-    if (d->node->op == SSA_PHI) return d->has(SSADATA_loop_merging_phi) ? STEP() : step_of_phi(d, depth);
+    if (d->node->op == SSA_PHI) return d->is_loop_merging_phi() ? STEP() : step_of_phi(d, depth);
     const NODE* t = ssa_assignment(d->node);
     STEP s;
     if (!t) return s;
@@ -307,7 +307,7 @@ STEP REGION::step_of_value(const NODE* t, int depth) {
 // The phi at the head that a definition is a copy of, or null.
 const SSADATA* REGION::copied_phi(const SSADATA* d) const {
     for (int steps_left = 16; d && steps_left > 0; --steps_left) {
-        if (d->has(SSADATA_loop_merging_phi)) return d;
+        if (d->is_loop_merging_phi()) return d;
         const NODE* value = value_of(d);
         const NODE* use = value && value->op == SSA_USE ? value : nullptr;
         d = use ? SSADATA_of(ssa_reach(use)) : nullptr;
@@ -330,7 +330,7 @@ NODE* entry_argument(const SSADATA* phi, const struct LOOP* loop) {
 bool REGION::is_flip_flop() const {
     std::vector<const SSADATA*> phis;
     for (const SSADATA* d : members)
-        if (d->has(SSADATA_loop_merging_phi)) phis.push_back(d);
+        if (d->is_loop_merging_phi()) phis.push_back(d);
     return phis.size() == 2 && copied_phi(back_argument(phis[0], loop)) == phis[1] &&
            copied_phi(back_argument(phis[1], loop)) == phis[0];
 }
@@ -374,7 +374,7 @@ void REGION::set_linear(const STEP& s) {
 
 void REGION::classify() {
     for (SSADATA* d : members)
-        if (d->has(SSADATA_loop_merging_phi) && (!head || d->lexicalNumber < head->lexicalNumber)) head = d;
+        if (d->is_loop_merging_phi() && (!head || d->lexicalNumber < head->lexicalNumber)) head = d;
     if (print_debug) debug_printf("~~~#NON-TRIVIAL#1 SCR#%u L<%d>\n", members.front()->scrNumber, loop ? loop->uid : 0);
     STEP s;
     if (head && is_flip_flop()) {
@@ -408,7 +408,7 @@ void REGION::classify() {
 // ---- Definitions outside of cycles
 
 void classify_phi(SSADATA* d, const struct LOOP* loop) {
-    if (d->has(SSADATA_loop_merging_phi)) {
+    if (d->is_loop_merging_phi()) {
         const SSADATA* back = back_argument(d, loop);
         if (back && is_in(back->block, loop) && is_sequence(back)) d->ivClass = IVC_WRAPAROUND;
         return;
@@ -623,7 +623,7 @@ NODE* find_SSA_sym_init(SYMTAB* sym, struct LOOP* loop) {
     const SSADATA* entry = nullptr;
     for (const LIST* cell = loop->head->statements; cell && cell->first->op == SSA_PHI; cell = cell->rest) {
         const SSADATA* phi = SSADATA_of(cell->first);
-        if (phi && phi->has(SSADATA_loop_merging_phi) && ssa_variable(phi->node)->sym == sym)
+        if (phi && phi->is_loop_merging_phi() && ssa_variable(phi->node)->sym == sym)
             entry = SSADATA_of(entry_argument(phi, loop));
     }
     auto at = loop->rdefs.find(sym);

@@ -61,7 +61,12 @@ struct SSADATA {
     SSADATA& operator=(const SSADATA&) = delete;
     ~SSADATA();
     bool has(uint8_t bits) const { return (flags & bits) != 0; }
-    bool is_lattice_top() const { return ivClass == IVC_NONE && !value && !has(SSADATA_lattice_bot); }
+    bool is_lattice_bot() const { return has(SSADATA_lattice_bot); }
+    bool is_loop_merging_phi() const { return has(SSADATA_loop_merging_phi); }
+    bool is_monotonic_decr() const { return has(SSADATA_monotonic_decr); }
+    bool is_monotonic_incr() const { return has(SSADATA_monotonic_incr); }
+    bool is_visited() const { return has(SSADATA_visited); }
+    bool is_lattice_top() const { return ivClass == IVC_NONE && !value && !is_lattice_bot(); }
 };
 
 // Between these the function is in SSA form, with decorations. Works without a hierarchy too: nothing is a loop then.

@@ -43,8 +43,8 @@ void add_record(const SSADATA* phi, struct LOOP* loop) {
     iv->init = find_SSA_sym_init(v->sym, loop);
     // A wider sum that is converted wraps where the variable does.
     const bool wraps = v->tree->type->is_unsigned();
-    if (phi->has(SSADATA_monotonic_incr) && !wraps) iv->flags |= IV_increases;
-    if (phi->has(SSADATA_monotonic_decr) && !wraps) iv->flags |= IV_decreases;
+    if (phi->is_monotonic_incr() && !wraps) iv->flags |= IV_increases;
+    if (phi->is_monotonic_decr() && !wraps) iv->flags |= IV_decreases;
     add_constraints(phi, iv);
     if (print_debug) debug_printf("%s\n", tree_to_infix(iv->incrtree).c_str());
 }
@@ -53,7 +53,7 @@ void add_records(struct LOOP* loop) {
     std::vector<const SSADATA*> phis;
     for (const LIST* s = loop->head->statements; s && s->first->op == SSA_PHI; s = s->rest) {
         const SSADATA* d = SSADATA_of(s->first);
-        if (d && d->has(SSADATA_loop_merging_phi)) phis.push_back(d);
+        if (d && d->is_loop_merging_phi()) phis.push_back(d);
     }
     for (const SSADATA* d : phis) add_record(d, loop);
 }

@@ -51,6 +51,12 @@ void begin(bool force) {
     if (force || !has_hierarchy()) build_loop_hierarchy(force, false, force, 1);
 }
 
+// SSA form that a row without the normal form left is built anew in it.
+bool is_in_SSA_and_normal_form() {
+    if (kept == NOTHING) leave_kept_SSA_form();
+    return function_is_in_SSA_form;
+}
+
 // Neither the form nor simplifying takes an address of an object.
 void end() { kept = std::max(kept, FORM); }
 void end_of_changes() { kept = CHANGED_FORM; }
@@ -114,12 +120,12 @@ const FRAME D_where_loops_are = {[] {
 const FRAME N = {enter_form, end};
 const FRAME S = {enter_SSA, [] {}, true};
 const FRAME D_and_S = {[] {
-                           if (!function_is_in_SSA_form) begin(false);
+                           if (!is_in_SSA_and_normal_form()) begin(false);
                            enter_SSA();
                        },
                        end, true};
 const FRAME N_and_S = {[] {
-                           if (!function_is_in_SSA_form) enter_form();
+                           if (!is_in_SSA_and_normal_form()) enter_form();
                            enter_SSA();
                        },
                        end, true};

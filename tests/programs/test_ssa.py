@@ -61,6 +61,15 @@ class SSA(unittest.TestCase):
                     self.tools.optimize(self.unit, self.out, words + ["--debug:validate"])
                     self.assertEqual(difference(self.tools.execute(self.unit), self.tools.execute(self.out)), None)
 
+    def test_without_the_normal_form_and_with_it(self):
+        self.source.write_text("#include <zrun.h>\nlong double g[24];\nint main(void) {\n  long i;\n"
+                               "  for (i = 0; i < 20; i++) g[i] = g[i + 4] - g[15] + 2.0L;\n"
+                               "  put_f64(g[7]);\n  return 0;\n}\n")
+        self.tools.parse(self.source, self.unit)
+        for order in ("22,32,34", "21,31,34", "31,22,34"):
+            self.tools.optimize(self.unit, self.out, ["--opt_level=2", f"--opt_passes={order}", "--debug:validate"])
+            self.assertEqual(difference(self.tools.execute(self.unit), self.tools.execute(self.out)), None)
+
 
 if __name__ == "__main__":
     unittest.main()

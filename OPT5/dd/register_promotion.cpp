@@ -12,6 +12,7 @@
 // change, and, behind a pointer, before a call that may not return: `if (p) s += *p` reads nothing ahead of the test.
 #include "OPT5/dd/register_promotion.h"
 
+#include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/frequencies.h"
@@ -70,6 +71,26 @@ bool is_candidate(const SSAVAR* v) {
     if (v->pointer) return only_its_name_reaches(base) && good_CSE_tree(v->tree, false);
     if (is_optimizer_temp(base->name, 'v', 'v')) return false;
     return name_accessed(v->tree) || good_CSE_tree(v->tree, false);
+}
+
+// Whether a place that may be a candidate is named at all: many a function works on registers alone, and needs no SSA
+// form here.
+bool names_memory(const NODE* statement) {
+    return any_subtree(statement, [](const NODE* t) {
+        if (t->op == UMULT || t->op == STREF) return true;
+        if (t->op != NAME || !t->u.sym || t->u.sym->is_function() || t->u.sym->level == 1) return false;
+        const SYMTAB* sym = t->u.sym;
+        const bool is_register = sym->level != 0 && sym->is_automatic() && !may_be_reached_by_pointers(sym);
+        return !is_register || !sym->type->is_scalar() || t->type->size != sym->size;
+    });
+}
+
+bool function_names_memory() {
+    need(fact::alias);
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            if (s->first && !tree_is_arg_prolog(s->first) && names_memory(s->first)) return true;
+    return false;
 }
 
 // ---- What happens to them
@@ -651,6 +672,7 @@ bool promote_vars_to_registers(bool with_assertions) {
     if (!currfuninfo || !currfuninfo->bb_list || !currfuninfo->stack_is_laid_out) return false;
     if (currfuninfo->saves_environment || TEST_FLAG(currfuninfo, FUN_is_interrupt)) return false;
     if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'promote_SSA_vars_to_registers' ------\n");
+    if (!function_names_memory()) return false;
     PROMOTION_TEMPS temps;
     const SWEEP first = sweep(temps, with_assertions, false);
     if (first == LOADS_CHANGED) sweep(temps, with_assertions, true);

@@ -314,6 +314,10 @@ void check_types(const NODE* t) {
     case REAL:
     case IMAG: return check_type(t->left, t, t->left->type->is_complex() || t->left->type->is_vector());
     case SCONV: return check_type(t->left, t, is_operand_type(t->left->type));
+    case STDOT:
+    case STREF:
+        if (t->right && t->right->mval) check_type(t, t, t->type->is_complex() == t->right->mval->type->is_complex());
+        return;
     default:
         if (opcode_is_ASG(t->op)) check_assignment(t);
     }

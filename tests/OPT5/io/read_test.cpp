@@ -217,6 +217,17 @@ TEST_F(ShapeTest, TruthIsAScalar) {
     IC_SYMBOL* f = global("_f", int_fn, 5);
     refuses(node(op::CBRANCH, i, name(f), ref(1)), "the truth of a int()");
 }
+TEST_F(ShapeTest, AMemberIsReadAsOfItsKind) {
+    TYPE* type = pkg.mk_struct("s", 16, 16, false);
+    auto* m = new fkMDATA("m", i, 0, 0, 0, false, false, false, false);
+    pkg.set_mdata(type, m);
+    pkg.type_frozen(type);
+    IC_NODE* field = node(op::FIELD, i);
+    field->mk_field(1, m, type);
+    TYPE* complex = pkg.mk_complex(pkg.float_t);
+    refuses(node(op::ASG, complex, node(op::STDOT, complex, name(global("_s", type, 2)), field), icon(1)),
+            "STDOT of type complex float");
+}
 TEST_F(ShapeTest, ConstantsHaveTheirKindOfType) {
     refuses(node(op::ASG, i, name(x), icon(1, pkg.float_t)), "a constant ICON of type float");
 }

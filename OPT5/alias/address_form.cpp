@@ -32,7 +32,7 @@ public:
 
 private:
     const NODE* without_marks(const NODE* t) const override {
-        while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || (t->op >= SSA_USE && t->op <= SSA_CHI))
+        while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || op_wraps_for_SSA(t->op))
             t = t->left;
         return t;
     }
@@ -90,7 +90,7 @@ void add_value(ADDRESS_FORM& form, const NODE* t) {
 
 const NODE* without_wrappers(const NODE* t) {
     while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || t->op == DDNODE ||
-           (t->op >= SSA_USE && t->op <= SSA_CHI))
+           op_wraps_for_SSA(t->op))
         t = t->left;
     return t;
 }

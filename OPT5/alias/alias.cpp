@@ -21,7 +21,7 @@ namespace {
 
 const NODE* without_wrappers(const NODE* t) {
     while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || t->op == DDNODE ||
-           (t->op >= SSA_USE && t->op <= SSA_CHI))
+           op_wraps_for_SSA(t->op))
         t = t->left;
     return t;
 }

@@ -61,7 +61,7 @@ unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop) {
 
 unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop) {
     const NODE* t = lvalue;
-    while (t->op == IDENTITY || t->op == DDNODE || (t->op >= SSA_USE && t->op <= SSA_CHI)) t = t->left;
+    while (t->op == IDENTITY || t->op == DDNODE || op_wraps_for_SSA(t->op)) t = t->left;
     if (t->op == UMULT && !t->right) return pointee_alignment(t->left, loop);
     return alignment_of_form(address_form(t), true);
 }

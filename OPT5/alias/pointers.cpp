@@ -76,7 +76,7 @@ bool is_null_constant(const NODE* t) {
 void POINTER_WRITES::collect(const NODE* t) {
     if (!writes_left_operand(t->op) || !t->left) return;
     const NODE* to = t->left;
-    while (to->op >= SSA_USE && to->op <= SSA_CHI) to = to->left;
+    while (op_wraps_for_SSA(to->op)) to = to->left;
     if (to->op != NAME || !to->u.sym || !to->u.sym->type->is_pointer()) return;
     if (t->op == ASG) {
         definitions.push_back({to->u.sym, t->right});

@@ -3,7 +3,7 @@
 //
 // Forward, the occurrences are loads and one is inserted where a later one becomes redundant. Backward, they are stores: a
 // store that is overwritten later is the mirror image of a load whose value is known already. What is inserted is never
-// more than what goes, on any path from the entry to the end.
+// more than what is removed, on any path from the entry to the end.
 //
 // Sources: J. Knoop, O. Ruething, B. Steffen, "Lazy Code Motion", 1992; K.-H. Drechsler, M. P. Stadel, "A Variation of
 // Knoop, Ruething and Steffen's Lazy Code Motion", 1993; R. Lo et al., "Register Promotion by Sparse Partial Redundancy
@@ -51,7 +51,7 @@ public:
     explicit MOTION(const MOTION_GRAPH& graph);
     std::vector<MOTION_SETS> sets; // by block; filled by the caller, but for what the graph closes
 
-    // An occurrence is certain to follow each start of a block, before anything is in its way.
+    // An occurrence is certain to follow each start of a block, before anything that bars it.
     std::vector<CANDIDATES> anticipated() const;
     // The value is good at the start of the block, on each path to it.
     std::vector<CANDIDATES> available(const INSERTIONS& inserted) const;

@@ -67,7 +67,8 @@ void wrapup_dependence_analysis(bool keep) {
 }
 
 DDEPNODE* get_DDEPNODE_from_tree(const NODE* t) {
-    while (t->op == STDOT || t->op == DDNODE) t = t->left;
+    t = without_members(t);
+    if (t->op == DDNODE) t = without_members(static_cast<const NODE*>(t->left));
     return t->op == UMULT ? t->rare().dependence : nullptr;
 }
 

@@ -44,7 +44,7 @@ public:
     // Of `v1` in `l1` and `v2` in `l2`, `v1` first where `order` is above 0.
     void add_dependencies(NODE* v1, struct LOOP* l1, NODE* v2, struct LOOP* l2, int order);
     DDEP* get_dep_edge(const NODE* from, const NODE* to, int n) const; // the n-th vector, from 0; null without
-    void remove_dep_edge(const NODE* from, const NODE* to, int n);     // the edge goes with its last vector
+    void remove_dep_edge(const NODE* from, const NODE* to, int n);     // the last one: the edge too
     void add_dep_edge(NODE* from, NODE* to, DDEP_PTR vector);          // behind those that are there
     void dump() const;                                                 // to the debug stream
 

@@ -367,11 +367,7 @@ private:
     // The address of the place: of an object, or the pointer and what is added.
     bool read_place(const NODE* place, int64_t k) {
         int64_t bits = 0;
-        const NODE* object = place;
-        while (object->op == STDOT && object->right->mval && !object->right->mval->is_bitfld) {
-            bits += static_cast<int64_t>(object->right->mval->offset);
-            object = object->left;
-        }
+        const NODE* object = without_members(place, &bits); // no bit-field: it has no address
         if (bits % ADDRESS_UNIT_BITS || (object->op != NAME && object->op != UMULT))
             return form.add(own(maketree(UAND, copy_tree(place), nullptr, tp->mk_ptr(place->type))), k);
         form.add_constant(form.reduced(WIDE(k) * (bits / ADDRESS_UNIT_BITS)));

@@ -81,7 +81,7 @@ public:
     bool whole_BWD() const { return overflow_low && bwd == ~uint64_t(0); }
 
     // Single distances. Beyond the limits the mark of the side stands for them: it may be set, kept and asked, and
-    // goes only where all that it may stand for is to go.
+    // is cleared only where all that it may stand for is.
     DVE& set_distance(INT65 d);
     DVE& clr_distance(INT65 d);          // beyond the limits: nothing is removed
     DVE& keep_sole_distance(INT65 d);    // the others go

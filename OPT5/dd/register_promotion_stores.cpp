@@ -1,12 +1,12 @@
 // Stores to memory that register promotion takes out or moves: the mirror image of its loads.
 //
-// A store goes that another store overwrites on every path, with nothing between that may read the place or make the
+// A store is removed that another store overwrites on every path, with nothing between that may read the place or make the
 // difference seen. A store in a loop that runs ahead of each exit is made behind the loop once, on the edges out of it: in
 // the loop its value lives in the temporary of the place.
 //
 // Needs: SSA form, as the loads left it. Leaves: nothing of what rests on the graph.
 // Sound because what is inserted lies behind a store on every path, with nothing between that touches the place, so that
-// nothing is stored where nothing was, and a store goes only where another follows on every path. A call, assembly and a
+// nothing is stored where nothing was, and a store is removed only where another follows on every path. A call, assembly and a
 // volatile access end such a path, and so do a statement that an exception may leave and a return; a block from which
 // control does not come to the end of the function keeps its stores. Constant objects are not written at all.
 #include "OPT5/dd/register_promotion.h"

@@ -32,6 +32,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/node.h"
+#include "OPT5/ir/trees.h"
 #include "XINT/int65.h"
 
 #include <cstdint>
@@ -103,7 +104,6 @@ void enter_ssa_definition(NODE* node, SSAVAR* variable, BBLK* block);
 
 // ---- Operators
 
-inline bool op_is_SSA(int op) { return op >= SSA_PHI && op <= SSA_CHI; }
 inline bool op_is_SSA_definition(int op) { return op == SSA_PHI || op == SSA_DEF || op == SSA_CHI; }
 inline SSAVAR* ssa_variable(const NODE* t) { return t->u.ssa; }
 // The statement is simplified when the function leaves the form, or, in normal form, when its trees leave that.
@@ -123,9 +123,6 @@ const std::vector<SSA_ARG>& ssa_args(const NODE* phi);
 
 NODE* make_SSA_USE(NODE* reference, SSAVAR* variable, NODE* definition); // consumes the reference
 NODE* make_SSA_USE_for_rdef(NODE* definition, SSAVAR* variable);         // of a copy of the variable's tree
-// Below SSA_DEF, SSA_MU, SSA_CHI: the tree that they stand for.
-NODE* below_SSA(NODE* t);
-const NODE* below_SSA(const NODE* t);
 // The assignment of an SSA_DEF (ASG, STASG, a compound one, ++, --), null of another definition.
 NODE* ssa_assignment(NODE* definition);
 bool ssa_value_is_likely_register(const NODE* tree); // an SSA_USE of one, or a NAME that would be

@@ -54,12 +54,6 @@ NODE* make_SSA_USE_for_rdef(NODE* definition, SSAVAR* variable) {
     return make_SSA_USE(copy_tree(variable->tree), variable, definition);
 }
 
-const NODE* below_SSA(const NODE* t) {
-    while (t && t->op >= SSA_USE && t->op <= SSA_CHI) t = t->left;
-    return t;
-}
-NODE* below_SSA(NODE* t) { return const_cast<NODE*>(below_SSA(static_cast<const NODE*>(t))); }
-
 NODE* ssa_assignment(NODE* definition) {
     if (!definition || definition->op != SSA_DEF) return nullptr;
     NODE* t = below_SSA(definition);

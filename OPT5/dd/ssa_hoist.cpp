@@ -108,11 +108,6 @@ bool is_plain(const TYPE* t) {
 
 bool is_load(int op) { return op == UMULT || op == STREF || op == STDOT; }
 
-const NODE* without_ssa(const NODE* t) {
-    while (op_is_SSA(t->op) && t->left) t = t->left;
-    return t;
-}
-
 // An object, or a part of one: it is there.
 bool is_named(const NODE* access) {
     access = without_members(access);
@@ -299,7 +294,7 @@ private:
     // ---- Collection
 
     void statement(LIST* s, BBLK* bb) {
-        const NODE* t = without_ssa(s->first);
+        const NODE* t = below_SSA(s->first);
         if (t->op == SSA_PHI || t->op == NASSERT || t->op == ASSERT || t->op == PPRAGMA || t->op == ASM ||
             tree_is_EH_SWITCH(t))
             return;
@@ -348,7 +343,7 @@ private:
 
     static bool is_candidate(const NODE* t) {
         if (!is_small(t)) return false;
-        const NODE* access = without_ssa(t);
+        const NODE* access = below_SSA(t);
         if (access->op == NAME || op_is_SSA_definition(t->op) || is_named(access) || !is_plain(t->type)) return false;
         // An address that is kept in a variable would let the object be reached by pointers.
         if (!good_CSE_tree(access, false) || (t->type->is_pointer() && tree_contains_op(t, UAND))) return false;

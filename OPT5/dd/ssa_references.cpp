@@ -90,8 +90,7 @@ void WRAPPER::operands_of_place(NODE** link) {
 void WRAPPER::access(NODE** link) {
     NODE* t = *link;
     SSAVAR* v = SSAVAR_for_reference(t, build);
-    NODE** base = link;
-    while ((*base)->op == STDOT) base = &(*base)->left;
+    NODE** base = link_without_members(link);
     if (is_access((*base)->op))
         operands_of_place(base);
     else

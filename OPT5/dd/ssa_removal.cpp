@@ -24,28 +24,8 @@ NODE* remove_SSA_operators_in_tree(NODE* t) {
     return t;
 }
 
-template <class COPY>
-static NODE* copy_without_SSA(const NODE* t, const COPY& copy) {
-    NODE* root = nullptr;
-    NODE** link = &root;
-    for (; t; t = t->left) {
-        if (op_is_SSA(t->op)) continue;
-        NODE* c = copy(t);
-        *link = c;
-        link = &c->left;
-        c->left = nullptr;
-        c->right = copy_without_SSA(static_cast<const NODE*>(t->right), copy);
-    }
-    return root;
-}
-
-NODE* copy_tree_removing_SSA_operators(const NODE* t) {
-    return copy_without_SSA(t, [](const NODE* n) { return copy_node(n); });
-}
-
-NODE* copy_dd_tree_removing_SSA_operators(const NODE* t) {
-    return copy_without_SSA(t, [](const NODE* n) { return copy_dd_node(n, true); });
-}
+NODE* copy_tree_removing_SSA_operators(const NODE* t) { return remove_SSA_operators_in_tree(copy_tree(t)); }
+NODE* copy_dd_tree_removing_SSA_operators(const NODE* t) { return remove_SSA_operators_in_tree(copy_dd_tree(t)); }
 
 static void leave_SSA_form_in(BBLK* bb) {
     for (LIST** link = &bb->statements; *link;) {

@@ -12,7 +12,7 @@
 // this is exact: it decides equal coefficients (one distance), a coefficient of 0 on one side (one iteration), opposite
 // ones (distances of one parity) and all others alike. With more levels what one level loses narrows the next.
 //
-// Sound because both conditions are necessary ones of the equation over the integers, and a distance goes only where
+// Sound because both conditions are necessary ones of the equation over the integers, and a distance is removed only where
 // they fail for every e. All of it is computed in 128 bits, in which nothing here overflows: coefficients have 33 bits,
 // counts 64, and there are at most 64 terms. Of sums that may wrap at the width of an address the equation holds modulo
 // that, which is one more unknown.

@@ -35,6 +35,8 @@ extern int float_micro_ops_to_op[16];
 // Fills the tables, then checks them against the I-file layer's table; a mismatch ends the run.
 void init_opcode_tables();
 
+constexpr bool op_is_SSA(int op) { return op >= SSA_PHI && op <= SSA_CHI; }
+constexpr bool op_wraps_for_SSA(int op) { return op >= SSA_USE && op <= SSA_CHI; } // stands for its operand
 constexpr bool op_is_float_compare(int op) { return op >= FEQ && op <= FUNO; }
 constexpr bool op_is_int_compare(int op) { return op >= EQ && op <= UGT; }
 constexpr bool op_is_call(int op) { return op == CALL || op == UCALL; }

@@ -149,16 +149,11 @@ bool tree_is_ASM_comment(const NODE* t) {
 // ---- Argument prolog
 namespace {
 
-const NODE* without_ssa(const NODE* t) {
-    while (t && t->op >= SSA_USE && t->op <= SSA_CHI) t = t->left;
-    return t;
-}
-
 bool is_wrapper_of_parameter(int op) { return op == SCONV || op == PCONV || op == ISP2CHAR; }
 
 // The parameter that a prolog's right side copies: through casts and UMULT(UAND()).
 const NODE* copied_parameter(const NODE* t) {
-    for (t = without_ssa(t); t; t = without_ssa(t)) {
+    for (t = below_SSA(t); t; t = below_SSA(t)) {
         if (is_wrapper_of_parameter(t->op))
             t = t->left;
         else if (t->op == UMULT && !t->right && t->left->op == UAND)
@@ -171,7 +166,7 @@ const NODE* copied_parameter(const NODE* t) {
 
 bool copies_parameter(const NODE* t, SYMTAB** local, SYMTAB** parm) {
     if (t->op != ASG && t->op != STASG) return false;
-    const NODE* to = without_ssa(t->left);
+    const NODE* to = below_SSA(t->left);
     if (!to || to->op != NAME || !to->u.sym || to->u.sym->level != 2) return false;
     const NODE* from = copied_parameter(t->right);
     if (!from || strcmp(to->u.sym->name, from->u.sym->name)) return false;
@@ -196,7 +191,7 @@ SYMTAB* partner_in_prolog(const NODE* t, const SYMTAB* sym) {
 
 bool tree_is_arg_prolog(const NODE* t) {
     SYMTAB *local, *parm;
-    t = without_ssa(t);
+    t = below_SSA(t);
     return t && (t->op == PCOMMA || copies_parameter(t, &local, &parm));
 }
 
@@ -205,7 +200,7 @@ bool stmt_is_arg_prolog(const LIST* stmt) { return stmt && stmt->first && tree_i
 bool tree_is_extended_arg_prolog(const NODE* t, const NODE* first) {
     if (tree_is_arg_prolog(t)) return true;
     if ((t->op != ASG && t->op != STASG) || !first) return false;
-    const NODE *to = without_ssa(t->left), *from = without_ssa(t->right);
+    const NODE *to = below_SSA(t->left), *from = below_SSA(t->right);
     return to && to->op == NAME && to->u.sym && to->u.sym->level == 2 && from && from->op == NAME &&
            tree_references_NAME(first, from);
 }
@@ -443,7 +438,7 @@ static bool is_part(int op) {
 }
 
 SYMTAB* object_name_if_known(const NODE* t) {
-    while (t && (is_transparent(t->op) || is_part(t->op) || (t->op >= SSA_USE && t->op <= SSA_CHI))) t = t->left;
+    while (t && (is_transparent(t->op) || is_part(t->op) || op_wraps_for_SSA(t->op))) t = t->left;
     if (!t) return nullptr;
     if (t->op == NAME) return t->u.sym;
     return t->op == STREF || t->op == UMULT ? pointee_name_if_known(t->left) : nullptr;

@@ -51,6 +51,12 @@ SYMTAB* get_callee_for_call(const NODE* call); // of CALL or UCALL through UAND(
 NODE* get_arguments_to_call(const NODE* call);
 
 // ---- Queries
+// What the SSA operators on a tree stand for; a phi stays, and so does null.
+inline const NODE* below_SSA(const NODE* t) {
+    while (t && op_wraps_for_SSA(t->op)) t = t->left;
+    return t;
+}
+inline NODE* below_SSA(NODE* t) { return const_cast<NODE*>(below_SSA(static_cast<const NODE*>(t))); }
 bool tree_has_side_effects(const NODE* t);    // a volatile read is one
 bool lvalue_is_volatile(const NODE* t);       // of NAME, UMULT, STDOT, STREF, by the node, its object and `volit_vars`
 bool is_def_assert_ICALL_tree(const NODE* t); // a fact attached to a value: ICALL "def$assert"(value, fact, text)

@@ -42,7 +42,7 @@ inline bool op_has_effect(int op) { return side_effects[op] != 0; }
 inline bool op_transfers_control(int op) { return side_effects[op] == 2; }
 // Gives its left operand a value. A loop's counter is one; an operator of SSA form speaks of what stands below it.
 inline bool writes_left_operand(int op) {
-    return (side_effects[op] == 1 && !(op >= SSA_PHI && op <= SSA_CHI)) || op == ARASG || op == LOOP ||
+    return (side_effects[op] == 1 && !op_is_SSA(op)) || op == ARASG || op == LOOP ||
            op == INITLOOP || op == ENDLOOP;
 }
 
@@ -100,6 +100,10 @@ template <class N>
 N* without_members(N* t) {
     while (t->op == STDOT) t = t->left;
     return t;
+}
+inline NODE** link_without_members(NODE** link) { // the link that holds it
+    while ((*link)->op == STDOT) link = &(*link)->left;
+    return link;
 }
 
 // The same where the members are first ones, no bit-fields: the place begins where what is returned does.

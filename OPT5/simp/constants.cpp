@@ -21,15 +21,10 @@ bool is_effective_leaf(const NODE* tree) {
     return !tree->left && !tree->right;
 }
 
-static const NODE* without_ssa(const NODE* t) {
-    while (t->op >= SSA_USE && t->op <= SSA_CHI && t->left) t = t->left;
-    return t;
-}
-
-bool is_name(const NODE* tree) { return without_ssa(tree)->op == NAME; }
+bool is_name(const NODE* tree) { return below_SSA(tree)->op == NAME; }
 
 SYMTAB* symbol_of_name(const NODE* tree) {
-    tree = without_ssa(tree);
+    tree = below_SSA(tree);
     return tree->op == NAME ? tree->u.sym : nullptr;
 }
 

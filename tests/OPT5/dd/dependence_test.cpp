@@ -24,7 +24,7 @@ struct NEST_LEVEL {
     int from, from_outer, step, trips, trips_outer; // `trips` + `trips_outer` times the outer count, at least 1
 };
 enum FORM { INDEXED, BY_TEMPORARY, WALKING };
-// object[constant + sum of by[l] * i_l + by_unknown * k], an access of `units` 16-bit units. A walking one goes through
+// object[constant + sum of by[l] * i_l + by_unknown * k], an access of `units` 16-bit units. A walking one is made through
 // a pointer that is set ahead of the loop `set_ahead_of`, and moved by the innermost factor in each innermost
 // iteration.
 struct ACCESS {

@@ -16,7 +16,7 @@ NODE* strip_ddep_info_from_tree(NODE* tree); // records of dependence and DDNODE
 // All statements of the current function; `trees_are_normalized` tells the form that they have.
 void normalize_all_trees();
 void denormalize_all_trees(bool keep_ddnodes, bool simplify);
-void denormalize_unchanged_trees(); // of a step whose trees are simplified: what the form itself made is simplified
+void denormalize_unchanged_trees(); // of steps whose trees are simplified: what the form made, or was marked, is
 
 // A parameter copy of the argument prolog that copies a scalar with a qualifier that bars optimization is split: a
 // local without the qualifier takes the value.

@@ -398,11 +398,13 @@ void normalize_all_trees() {
 
 void denormalize_unchanged_trees() {
     trees_are_normalized = false;
-    rewrite_statements([](NODE* t) {
-        made_an_address = false;
-        t = denormalize(t, false);
-        return made_an_address ? simp_tree(t, nullptr) : t;
-    });
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s; s = s->rest) {
+            made_an_address = false;
+            s->first = denormalize(s->first, false);
+            if (made_an_address || s->flag2) s->first = simp_tree(s->first, nullptr);
+            s->flag2 = 0;
+        }
 }
 
 void denormalize_all_trees(bool keep_ddnodes, bool simplify) {

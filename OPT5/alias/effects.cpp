@@ -197,6 +197,14 @@ bool tree_acts(const NODE* tree) {
     return any_subtree(tree, [](const NODE* t) { return op_has_effect(t->op); });
 }
 
+bool tree_changes_nothing(const NODE* tree) {
+    if (!tree_has_side_effects(tree)) return true;
+    return !any_subtree(tree, [](const NODE* t) {
+        if (is_lvalue(t)) return lvalue_is_volatile(t);
+        return op_has_effect(t->op) && !(op_is_call(t->op) && !call_may_modify(t, nullptr));
+    });
+}
+
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
     const bool is_volatile = lvalue_is_volatile(lvalue);
     return any_subtree(a, [=](const NODE* t) { return node_may_modify(t, lvalue, is_volatile); });

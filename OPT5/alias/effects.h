@@ -80,6 +80,9 @@ SYMTAB* assigned_variable(const NODE* t);
 // Whether evaluating `tree` does anything but compute a value; reading a volatile object is no act here.
 bool tree_acts(const NODE* tree);
 
+// Whether evaluating `tree` leaves all that a tree may read as it is: its only acts are calls that write nothing.
+bool tree_changes_nothing(const NODE* tree);
+
 // ---- Changes
 
 // Whether evaluating `a` may change what `t` reads: the objects, and the addresses it reads them by.

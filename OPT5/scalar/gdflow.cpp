@@ -52,7 +52,7 @@ int weight_of_operator(const NODE* t) {
 }
 
 bool reads_come_first(const NODE* t) {
-    auto acts = [](const NODE* n) { return n && tree_has_side_effects(n); };
+    auto acts = [](const NODE* n) { return n && !tree_changes_nothing(n); };
     switch (t->op) {
     case RETURN: return !acts(t->right);
     case IF:

@@ -382,6 +382,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     const bool is_plain = t->op == ASG || t->op == STASG;
     if (t->right->op == CALL || t->op == STASG) {
         read_operands(t->right, true);
+        if (t->op == ASG) v = numbers.fresh(); // a call's
     } else {
         v = numbers.of(t->right);
         if (!is_plain) v = numbers.of_step(t, numbers.of(t->left), v);
@@ -396,6 +397,15 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
 bool holds_step(const NODE* t) {
     return op_of_opASG[t->op] != ILLOP && t->left->type->is_int() &&
            compound_ASG_computes_in(t->left->type->stqs(), op_of_opASG[t->op], t->left, t->right);
+}
+
+// Neither a constant nor a variable: what would have to be computed, or loaded, again.
+bool is_computed_value(const NODE* t) {
+    while (t->op == SCONV || t->op == PCONV || t->op == ISP2CHAR) {
+        if (t->left->type->is_float() != t->type->is_float()) break;
+        t = t->left;
+    }
+    return number_of_operands[t->op] != 0 && t->op != NAME && t->op != UAND;
 }
 
 // The target has the value from here on.
@@ -414,13 +424,13 @@ void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
     if (object->op != NAME && tree_modifies_lvalue_in_tree(t, object->left)) return;
     numbers.stored(to, v);
     OCCURRENCES& known = values[v];
-    if (t->op == ASG || known.first || !holds_step(t)) return;
-    known.first = &current->first;
+    if (known.first || !(t->op == ASG ? is_computed_value(t->right) : holds_step(t))) return;
+    known.is_step = t->op != ASG;
+    known.first = known.is_step ? &current->first : &current->first->right;
     known.cell = current;
-    known.is_step = true;
     known.order = ++order;
     known.block = blocks.size();
-    known.gain -= 1 + numbers.cost_of(to);
+    if (known.is_step) known.gain -= 1 + numbers.cost_of(to);
 }
 
 // ---- Reads

@@ -61,7 +61,9 @@ bool reads_come_first(const NODE* t) {
     case ASG:
         if (tree_is_arg_prolog(t) || acts(t->left)) return false;
         return t->right->op == CALL ? reads_come_first(t->right) : !acts(t->right);
-    case STASG: return !tree_is_arg_prolog(t) && !acts(t->left) && !acts(t->right);
+    case STASG:
+        if (tree_is_arg_prolog(t) || acts(t->left)) return false;
+        return t->right->op == CALL ? reads_come_first(t->right) : !acts(t->right);
     default: return is_operator_assignment(t) && t->right && !acts(t->left) && !acts(t->right);
     }
 }

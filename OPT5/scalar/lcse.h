@@ -1,5 +1,5 @@
-// Common subexpressions within chains of blocks (lcse.cpp), known values of parts of objects (known_parts.cpp), and dead
-// stores to them (subrange.cpp).
+// Common subexpressions within chains of blocks (lcse.cpp), known values of parts of objects (lcp.cpp), and dead stores
+// to them (subrange.cpp).
 #pragma once
 
 class NODE;

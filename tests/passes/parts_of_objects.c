@@ -93,7 +93,7 @@ void holds_pointer(int* q, int x) {
 }
 
 // FUNCTION: restricted
-// HAS: y = k
+// HAS: *q ^= k
 // NOT: * 17
 int restricted(int* restrict p, int* restrict q, int x) {
     int k = x * 19, y;

@@ -144,7 +144,7 @@ int stopped(int n, struct box* p) {
 }
 
 // FUNCTION: outer_and_inner
-// HAS: /H\d+ = /
+// HAS: /U\d+ = \(\*p\)\.limit/
 int outer_and_inner(struct box* p, int d) {
     int i, k, s = 0;
     for (i = 0; i < 5; i++)

@@ -12,6 +12,7 @@
 #include "OPT5/scalar/implied_tests.h"
 #include "OPT5/dd/inductions.h"
 #include "OPT5/scalar/known_signs.h"
+#include "OPT5/scalar/lcp.h"
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/dd/merge.h"
 #include "OPT5/scalar/rename.h"
@@ -22,7 +23,7 @@
 
 namespace {
 
-constexpr long OLD = 3, NEW = 5;
+constexpr long OLD = 5, NEW = 3;
 constexpr int NO_WRAPPER = ILLOP;
 
 // One function with one write in it.
@@ -175,6 +176,14 @@ TEST(WrittenPlaces, Superblocks) {
     expect_seen("the superblock", [](WORLD& w) {
         w.build_store_write_load();
         optimize_superblocks_in_cfg();
+        return !w.old_value_is_read_behind();
+    });
+}
+
+TEST(WrittenPlaces, Copies) {
+    expect_seen("what assignments in force give", [](WORLD& w) {
+        w.build_store_write_load();
+        copyprop(1);
         return !w.old_value_is_read_behind();
     });
 }

@@ -11,6 +11,7 @@
 #include "OPT5/alias/address_form.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/points_to.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loop_callbacks.h"
@@ -133,13 +134,9 @@ bool may_differ_in_loop(const NODE* tree, struct LOOP* loop) {
     return loop && !(loop_callbacks.is_constant_in && loop_callbacks.is_constant_in(tree, loop));
 }
 
-} // namespace
-
-ADDRESS_FORM address_form(const NODE* lvalue) {
-    ADDRESS_FORM form;
-    form.width = access_width(lvalue);
-    add_lvalue(form, lvalue);
-    if (form.object || !currfuninfo) return form;
+// What is known of pointer variables at every place.
+void find_object(ADDRESS_FORM& form) {
+    if (form.object || !currfuninfo) return;
     for (const LINEAR_FORM::TERM& term : form) {
         const NODE* p = term.tree;
         if (p->op != NAME || !p->type->is_pointer() || term.coefficient != BITS_PER_UNIT) continue;
@@ -155,6 +152,23 @@ ADDRESS_FORM address_form(const NODE* lvalue) {
         }
         break;
     }
+}
+
+} // namespace
+
+ADDRESS_FORM address_form(const NODE* lvalue) {
+    ADDRESS_FORM form;
+    form.width = access_width(lvalue);
+    add_lvalue(form, lvalue);
+    find_object(form);
+    if (!form.known_object()) form.points_into = single_pointsto_target_if_known(PT_info_of(lvalue));
+    return form;
+}
+
+ADDRESS_FORM pointer_form(const NODE* pointer) {
+    ADDRESS_FORM form;
+    add_value(form, pointer);
+    find_object(form);
     return form;
 }
 
@@ -185,7 +199,11 @@ bool accesses_are_disjoint(const ADDRESS_FORM& a, const ADDRESS_FORM& b, struct 
     for (const LINEAR_FORM::TERM& y : b)
         if (!is_matched[&y - b.begin()]) g = long_gcd(g, magnitude(y.coefficient));
     const INT65 distance = INT65(b.constant) - INT65(a.constant); // of b behind a
-    if (g.is_zero()) return distance >= a.width || -distance >= b.width;
-    const INT65 behind = residue(distance, g);
-    return behind >= a.width && g - behind >= b.width;
+    return accesses_are_apart(distance, g, a.width, b.width);
+}
+
+bool accesses_are_apart(INT65 distance, INT65 step, INT65 width_a, INT65 width_b) {
+    if (step.is_zero()) return distance >= width_a || -distance >= width_b;
+    const INT65 behind = residue(distance, step);
+    return behind >= width_a && step - behind >= width_b;
 }

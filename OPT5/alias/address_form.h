@@ -21,6 +21,11 @@ struct ADDRESS_FORM : LINEAR_FORM {
 };
 
 ADDRESS_FORM address_form(const NODE* lvalue);
+ADDRESS_FORM pointer_form(const NODE* pointer); // the place that it points to; no width, no `points_into` of one access
+
+// Whether two accesses are apart wherever the second lies `distance` bits behind the first, plus any multiple of `step`;
+// 0: none.
+bool accesses_are_apart(INT65 distance, INT65 step, INT65 width_a, INT65 width_b);
 
 // Whether two accesses have no bit in common for certain. A term that is in both stands for one value where `loop` is
 // null or the term does not change in it.

@@ -2,6 +2,7 @@
 #include "OPT5/alias/alias.h"
 
 #include "OPT5/alias/address_form.h"
+#include "OPT5/alias/points_to.h"
 #include "OPT5/alias/state.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
@@ -15,7 +16,6 @@
 
 
 void init_dd_aliasing() { need(fact::alias); }
-void propagate_PT_info() {}
 
 namespace {
 
@@ -160,13 +160,15 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
     const ADDRESS_FORM x = address_form(a), y = address_form(b);
     const SYMTAB *object_a = x.known_object(), *object_b = y.known_object();
     if (object_a && object_b) {
-        if (object_a == object_b) return !accesses_are_disjoint(x, y, loop);
+        if (object_a == object_b)
+            return !accesses_are_disjoint(x, y, loop) && UMULT_PT_targets_may_overlap(a, x, b, y);
         return object_symbols_may_alias(object_a, object_b);
     }
     if (object_a && is_out_of_reach(object_a, b, y)) return false;
     if (object_b && is_out_of_reach(object_b, a, x)) return false;
     if (accesses_are_disjoint(x, y, loop)) return false;
     if (are_kept_apart(a, b, loop != nullptr) || are_told_apart_by_records(a, b)) return false;
+    if (!UMULT_PT_targets_may_overlap(a, x, b, y)) return false;
     const NODE *p = pointer_of(a), *q = pointer_of(b);
     if (loop && p && q && pointers_are_antialiased(p, q, loop, loop)) return false;
     if (by_type) {

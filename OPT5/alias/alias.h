@@ -19,7 +19,8 @@ struct LS;
 struct fkMDATA;
 
 // alias.cpp has the rules on pairs, type_rules.cpp the rule on types, address_taken.cpp the marks, pointers.cpp what
-// pointers are based on, alignment.cpp the alignments.
+// pointers are based on, alignment.cpp the alignments. Where `fact::points_to` is known it sharpens the answers on pairs,
+// see points_to.h.
 
 // ---- Life
 // A pass asks for what it relies on with `need`: `fact::alias_marks` sets `is_aliased` of every symbol of the current
@@ -33,7 +34,6 @@ void mark_aliased_vector_and_complex_symbols(bool clear_bitnum, bool aliased);
 void reset_alias_info(); // what is known of the current function's references is dropped
 void clean_up_alias_analysis_bitvecs_etc();
 void init_dd_aliasing();
-void propagate_PT_info(); // points-to sets of the current function's pointers
 // Whether the uses of every file-scope symbol have been entered in its `cqual`: from the step that analyzes them on.
 extern bool file_symbols_are_known;
 bool file_symbol_may_be_aliased(const SYMTAB* sym); // reached other than by its name, as far as the program is known

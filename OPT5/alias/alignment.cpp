@@ -3,6 +3,7 @@
 #include "OPT5/alias/alias.h"
 
 #include "OPT5/alias/address_form.h"
+#include "OPT5/alias/points_to.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
 
@@ -62,6 +63,6 @@ unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop) {
 unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop) {
     const NODE* t = lvalue;
     while (t->op == IDENTITY || t->op == DDNODE || op_wraps_for_SSA(t->op)) t = t->left;
-    if (t->op == UMULT && !t->right) return pointee_alignment(t->left, loop);
+    if (t->op == UMULT && !t->right) return std::max(pointee_alignment(t->left, loop), overall_PT_align(PT_info_of(t)));
     return alignment_of_form(address_form(t), true);
 }

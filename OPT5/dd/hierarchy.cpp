@@ -290,7 +290,6 @@ void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoo
     unbuild_loop_hierarchy();
     if (!find_tree(requireLoops < 0 ? full : requireLoops != 0)) return;
     for (;;) {
-        if (scalars) propagate_PT_info();
         find_symbols_and_variables(loop_root());
         if (scalars) prep_loop_variables(full);
         if (full && replicate_while_tests(loop_root())) {
@@ -303,7 +302,6 @@ void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoo
     if (full) constrain_all_ranges();
     coalesce_compound_IF_statements();
     if (simplify) simplify_dd_loops(loop_root(), true, true);
-    propagate_PT_info();
     if (full) {
         if (loop_work.propagate_values) loop_work.propagate_values();
         find_loop_assertions(nullptr);

@@ -8,6 +8,8 @@
 
 #include "BANNER/banner.h"
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/points_to.h"
+#include "OPT5/alias/points_to_checks.h"
 #include "OPT5/cd/cd.h"
 #include "OPT5/cd/vectors.h"
 #include "OPT5/dd/dd.h"
@@ -128,6 +130,11 @@ void value_propagation_for_SIMD() {
     simpcfg(0, 0);
     rebuildcfg();
     simpcfg(0, 0);
+}
+
+void late_points_to() {
+    propagate_PT_info();
+    insert_PT_checks();
 }
 
 void global_CSE() {
@@ -270,7 +277,7 @@ const ROW steps[] = {
     /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},
     /* 64 */ {F, "global CP", nullptr, L2_with_branches, [] { unbuild_loop_hierarchy(); copyprop(2); }, none, graph},
-    /* 65 */ {L, "late points-to", nullptr, L2_with_branches, propagate_PT_info, none, none},
+    /* 65 */ {F, "late points-to", nullptr, L2_with_branches, late_points_to, none, every},
     /* 66 */ {F, "global CSE", nullptr, L2_with_branches, global_CSE, none, graph},
     /* 67 */ {L, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, none, none},
     /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph},

@@ -65,8 +65,8 @@ void changed(FACTS stays) {
 
 bool is_known(FACTS facts) { return currfuninfo && (currfuninfo->facts & facts) == facts; }
 
-void graph_was_changed(FUNINFO* f) { f->facts &= ~fact::graph; }
-void edges_were_changed(FUNINFO* f) { f->facts &= ~(fact::dominators | fact::loops); }
+void graph_was_changed(FUNINFO* f) { f->facts &= ~(fact::graph | fact::points_to); }
+void edges_were_changed(FUNINFO* f) { f->facts &= ~(fact::dominators | fact::loops | fact::points_to); }
 
 int validate_facts() {
     int wrong = 0;

@@ -22,10 +22,11 @@ constexpr FACTS alias_marks = 1 << 3;    // `is_aliased` of the function's symbo
 constexpr FACTS pointees = 1 << 4;       // FUNINFO::spmap: what pointer variables point into
 constexpr FACTS pointer_groups = 1 << 5; // the roots of the PTR records: which pointers come from one value, `restrict`
 constexpr FACTS live_variables = 1 << 6; // `bitnum` of the candidates, FUNINFO::live_sets
+constexpr FACTS points_to = 1 << 7; // bindings at accesses, and of pointers at the blocks' entries; ends with any edit of the graph
 constexpr FACTS graph = block_numbers | dominators | loops; // what blocks and edges alone decide
 constexpr FACTS alias = alias_marks | pointees | pointer_groups;
 constexpr FACTS every = ~FACTS(0);
-constexpr int count = 7;
+constexpr int count = 8;
 } // namespace fact
 
 struct FACT_FINDER {

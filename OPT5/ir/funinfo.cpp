@@ -287,6 +287,7 @@ void erase_all() {
     f->dominators.reset();
     f->loops.reset();
     f->live_sets.reset();
+    f->points_to.reset();
     f->facts = fact::none;
     f->spmap->clear();
     f->snmap->clear();

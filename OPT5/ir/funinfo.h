@@ -151,6 +151,7 @@ public:
     std::unique_ptr<Dominator> dominators;
     std::unique_ptr<NATURAL_LOOPS> loops;
     std::unique_ptr<LIVE_SETS> live_sets;
+    std::shared_ptr<void> points_to; // of `fact::points_to`; made and read by OPT5/alias
     // A private copy of the body for call integration, made before pass 2 and never worked on: a record of its own, which is
     // on no list. It stays when the body is erased.
     std::unique_ptr<FUNINFO> saved_cfg;

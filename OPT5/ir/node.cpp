@@ -35,6 +35,7 @@ NODE* clone_node(const NODE* t) {
     c->rare_m->dd = nullptr;
     c->rare_m->dependence = nullptr;
     c->rare_m->ssa_args = nullptr;
+    c->rare_m->ptenv = nullptr;
     return c;
 }
 

@@ -22,6 +22,7 @@ class SSAVAR;
 struct SSA_ARG;
 struct LIST;
 struct LS;
+struct PTENV;
 class BBLK;
 class FUNINFO;
 
@@ -60,6 +61,10 @@ struct RARE_FIELDS {
     std::vector<SSA_ARG>* ssa_args = nullptr; // SSA_PHI, of the node, not of its copies; owned by the form
     DDNODE_RECORD* dd = nullptr; // of the node, not of its copies
     DDEPNODE* dependence = nullptr; // UMULT, of the node, not of its copies
+    // UMULT, STREF: what the pointer may refer to where the node stands, of the node, not of its copies. It belongs to the
+    // run of points-to propagation that found it, and is read through OPT5/alias/points_to.h alone.
+    const PTENV* ptenv = nullptr;
+    uint32_t ptenv_run = 0;
 };
 
 // Where a call of the source stands. A copy keeps what the call was copied from.

@@ -7,6 +7,7 @@
 #include "OPT5/scalar/gdflow.h"
 
 #include "OPT5/alias/effects.h"
+#include "OPT5/alias/points_to.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -108,6 +109,8 @@ public:
         for (TRIPLE& t : unique_triples)
             std::stable_sort(t.sites.begin(), t.sites.end(),
                              [](const TRIPLE_SITE& a, const TRIPLE_SITE& b) { return a.block < b.block; });
+        // The tree of a triple is asked about for all its sites.
+        for (const auto& [number, accesses] : loads) share_PT_info(accesses);
     }
 
 private:
@@ -133,6 +136,7 @@ private:
     std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> numbers; // looked up, never walked
     std::unordered_map<int, size_t> triples;                  // by number
     std::unordered_map<const NODE*, KNOWN> known;             // of the trees of one statement
+    std::unordered_map<int, std::vector<NODE*>> loads;        // by number; the order of the walk decides nothing
     BBLK* block = nullptr;
     LIST* cell = nullptr;
     int position = 0;
@@ -193,6 +197,7 @@ ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
     int x = a.number, y = b.number;
     if (t->right && !is_member && commute_inv[t->op] == t->op && y < x) std::swap(x, y);
     k.number = number_of_key({t->op, code, payload, x, y});
+    if (t->op == UMULT || t->op == STREF) loads[k.number].push_back(const_cast<NODE*>(t));
     return k;
 }
 
@@ -280,7 +285,7 @@ const std::vector<TRIPLE_WRITE>& statements_that_may_stay() { return staying; }
 void annotate_cfg() {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'annotate_cfg' ----------\n");
     clean_up_gdflow_bitvecs();
-    need(fact::alias | fact::block_numbers);
+    need(fact::alias | fact::block_numbers | fact::points_to);
     ANNOTATOR().run();
 }
 

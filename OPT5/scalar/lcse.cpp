@@ -8,7 +8,7 @@
 // What is assigned to a variable that has its number already is dropped. A remainder is computed from the quotient of
 // its operands where that is known.
 //
-// Needs: alias marks, pointees, pointer groups. Leaves: what rests on the graph; symbols are split anew.
+// Needs: alias marks, pointees, pointer groups, points-to. Leaves: what rests on the graph; symbols are split anew.
 // Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
 // forgotten where the place or its address may change. Trees without effects alone are numbered, in statements that
 // evaluate all of them ahead of their one effect: of `*p + f()` the load may come first or last. The first occurrence
@@ -18,6 +18,7 @@
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
+#include "OPT5/alias/points_to.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
@@ -160,6 +161,7 @@ private:
             loads.erase(loads.begin());
         }
         loads.push_back({key, copy_tree(lvalue), v, marks_in(lvalue)});
+        carry_PT_info(loads.back().lvalue, lvalue); // which stands ahead, and its pointer has not changed since
     }
     void forget_loads() {
         for (const LOAD& l : loads) erase_tree(l.lvalue);
@@ -553,7 +555,7 @@ void COMMON_SUBEXPRESSIONS::keep(OCCURRENCES& known, VALUE v) {
 
 void lcse() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
-    need(fact::alias);
+    need(fact::alias | fact::points_to);
     COMMON_SUBEXPRESSIONS().run();
     changed(fact::graph);
 }

@@ -131,7 +131,11 @@ class Body(Writer):
                              lambda: f"gpp = &{rng.choice(('gp', 'gq', 'tab[0]', 's0.p', 'sp->p'))}",
                              lambda: f"t = &{rng.choice(STRUCTURES)}", lambda: f"sp = &{rng.choice(STRUCTURES)}",
                              lambda: f"last = {rng.choice(FOURS)}", lambda: f"one = {rng.choice(SINGLES)}",
-                             lambda: f"*pp = {rng.choice(FOURS)}", lambda: f"sp = sp->next"))() + ";")
+                             lambda: f"*pp = {rng.choice(FOURS)}", lambda: f"sp = sp->next",
+                             lambda: f"p = {self.test()} ? {self.four()} : {self.four()}",
+                             lambda: f"q = (int *)((unsigned long){self.four()} + x % 1)",
+                             lambda: f"{rng.choice(('p', 'q', 'gp'))} = (int *)(void *)(char *){rng.choice(FOURS)}",
+                             lambda: f"memcpy(&{rng.choice(('p', 'q', 's0.p'))}, &{rng.choice(PLACES[:2])}, sizeof p)"))() + ";")
 
     def copy(self):
         rng = self.rng
@@ -197,13 +201,16 @@ class Body(Writer):
 
         def write():
             self.scope.scalars.append(Var(f"*{name}", SMALL))
+            if rng.random() < 0.3:
+                self.put(f"{rng.choice(('p', 'q'))} = {self.four()};")
             for _ in range(rng.choice((1, 2, 2))):
                 self.put(self.store(rng.choice((Var(f"*{name}", SMALL), self.target())), 2))
             if rng.random() < 0.4:
                 self.statement(1)
             self.scope.scalars.pop()
 
-        self.braces(f"for (; {name} {rng.choice(('<', '!='))} {end}; {name}++) {{", write)
+        step = rng.choice(("++", "++", " += 2", f" = {name} + 3"))
+        self.braces(f"for (; {name} {'<' if '=' in step else rng.choice(('<', '!='))} {end}; {name}{step}) {{", write)
         self.in_loop //= 4
         self.indent -= 1
         self.put("}")

@@ -4,7 +4,8 @@ from .scope import Kind, Scope
 from .types import INT, LONG
 from .values import coerced
 
-HEAD = """#include <zrun.h>
+HEAD = """#include <string.h>
+#include <zrun.h>
 
 static unsigned long sum;
 

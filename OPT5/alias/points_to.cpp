@@ -20,7 +20,7 @@
 
 namespace {
 
-constexpr char POINTS_TO_IS_OFF = 7; // of `aux_cmd_flag`
+constexpr int POINTS_TO_IS_OFF = 7; // of `aux_cmd_flag`
 constexpr size_t MOST_CELLS = 400000;  // beyond these nothing is known
 constexpr int MOST_VISITS = 64;        // of one block
 constexpr unsigned MOST_POINTERS = 1u << 16;
@@ -179,7 +179,7 @@ void dump_PT_info(const PT_STORE& store) {
 void find_points_to(FACTS) {
     auto store = std::make_shared<PT_STORE>();
     currfuninfo->points_to = store;
-    if (aux_cmd_flag[static_cast<int>(POINTS_TO_IS_OFF)] || !currfuninfo->bb_list || currfuninfo->saves_environment) return;
+    if (aux_cmd_flag[POINTS_TO_IS_OFF] || !currfuninfo->bb_list || currfuninfo->saves_environment) return;
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'propagate_PT_info' -------\n");
     PROPAGATION(*store).run();
     if (print_debug >= 3) dump_PT_info(*store);

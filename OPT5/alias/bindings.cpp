@@ -58,7 +58,7 @@ uint32_t class_category(const SYMTAB* base) {
     // The linker may be told to put it at a fixed address.
     case SC_EXTDEF:
     case SC_EXTERN: return PT_EXTERN | PT_ADCON;
-    case SC_STATIC: return PT_STATICG | PT_STATICL | (base->pragma ? PT_ADCON : 0);
+    case SC_STATIC: return base->pragma ? PT_STATICG | PT_STATICL | PT_ADCON : PT_STATICG | PT_STATICL;
     default: return PT_ALL;
     }
 }

@@ -3,7 +3,8 @@
 // `x = 3; y = x + 1;` becomes `y = 4`: blocks are taken in an order in which definitions precede their uses, so that
 // one pass follows a chain of constants to its end, over phis with equal arguments too. From the second pass on a copy
 // `x = a` of a register is seen through where that leaves no use of x, and a computation in a loop whose only use is
-// behind the loop is done there.
+// behind the loop is done there. Behind the last pass a value of fewer numbers than its variable can hold, `x = a & 7`,
+// gets a variable of its own if no other value meets it: what is known of that variable holds wherever it is read.
 //
 // Needs: SSA form, numbered blocks. Leaves: the form, in which the definitions remain for who removes dead ones.
 // Sound because a use names the one definition whose value it reads. A constant is that value everywhere. A copy reads
@@ -24,6 +25,7 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/scalar/fcp.h"
+#include "OPT5/simp/known_bits.h"
 #include "OPT5/simp/simp.h"
 
 #include <algorithm>
@@ -33,6 +35,7 @@ namespace {
 
 constexpr int MOST_NODES = 500; // of a definition
 constexpr int MOST_PASSES = 3;
+constexpr int MOST_BOUNDED_VALUES = 64; // of a function; who asks for the bounds of a variable looks at each
 
 // Of a definition, by version.
 struct VALUE {
@@ -88,6 +91,32 @@ public:
         for (VALUE& v : values)
             if (v.is_copy) forget(v);
         return has_changed;
+    }
+
+    // `x = V`, where V has narrower bounds than x and reaches no phi: `y = V; x = y`, and y is read in place of x.
+    bool name_bounded_values() {
+        count_uses();
+        int left = MOST_BOUNDED_VALUES;
+        for (const SYM_RANGE* r = currfuninfo->widened; r; r = r->next) --left;
+        bool any = false;
+        for (BBLK* bb : by_number)
+            for (LIST** link = &bb->statements; *link && left > 0; link = &(*link)->rest) {
+                SYMTAB* temp = bounded_value((*link)->first, bb->loop);
+                if (!temp) continue;
+                NODE* asg = (*link)->first->left;
+                LIST** next = insert_before(link, mk_ASG(mk_NAME(temp), asg->right), (*link)->psn);
+                note_changed_statement(*link);
+                asg->right = mk_NAME(temp);
+                value_of((*next)->first).tree = mk_NAME(temp);
+                link = next;
+                any = true;
+                --left;
+            }
+        if (!any) return false;
+        for (BBLK* bb : by_number)
+            for (LIST* s = bb->statements; s; s = s->rest) rewrite(s, bb);
+        sym_split(currfuninfo);
+        return true;
     }
 
 private:
@@ -298,6 +327,28 @@ private:
         state[uid] = ++last_state;
     }
 
+    // The variable that is to hold the value that the statement gives to its own, with an entry of its bounds; null where
+    // there is nothing to say.
+    SYMTAB* bounded_value(NODE* def, struct LOOP* loop) {
+        const NODE* asg = assignment_of(def);
+        if (!asg || asg->left->op != NAME || tree_has_side_effects(asg->right)) return nullptr;
+        const SSAVAR* x = ssa_variable(def);
+        const VALUE& v = value_of(def);
+        TYPE* type = x->tree->type->stqs();
+        if (v.tree || v.uses == 0 || v.other != 0 || !x->has(SSAVAR_likely_register) || x->is_memory()) return nullptr;
+        if (!type->is_int() || type->is_bool() || type->size > 64 || is_copied_variable(asg->right)) return nullptr;
+        NODE* value = truncate_RHS_for_assignment(asg->left, copy_tree_removing_SSA_operators(asg->right));
+        INT65 min, max;
+        SYMTAB* temp = nullptr;
+        if (compatible_types(value->type, type, true) && calculate_bounds(value, loop, &min, &max) &&
+            (min > int_type_min(type) || max < int_type_max(type))) {
+            temp = sym_temp('y', -1, type, asg->left->ls);
+            make_widened_symbol_entry(temp, type, max, min, find_known_zeros(value, type), find_known_ones(value, type));
+        }
+        erase_tree(value);
+        return temp;
+    }
+
     // ---- Replacement
 
     void rewrite(LIST* s, BBLK* bb) {
@@ -325,7 +376,7 @@ private:
         if (t->op == SSA_USE && !is_place)
             if (NODE* value = value_for(t)) {
                 if (print_debug) {
-                    debug_printf("\t(%ld) SSA CP is replacing %s", line, tree_to_infix(t).c_str());
+                    debug_printf("\n\t(%ld) SSA CP is replacing %s", line, tree_to_infix(t).c_str());
                     debug_printf(" with %s\n", tree_to_infix(value).c_str());
                 }
                 changed_here = true;
@@ -402,6 +453,17 @@ private:
     long line = 0;
 };
 
+void dump_widened_symbol_entries() {
+    for (const SYM_RANGE* r = currfuninfo->widened; r; r = r->next) {
+        debug_printf("Widened symbol entry for %s:\n", r->sym->name);
+        debug_printf("    type:     %s\n", r->type->printstr().c_str());
+        debug_printf("    maxValue: %s\n", int2text(r->max, nullptr, 10, 0));
+        debug_printf("    minValue: %s\n", int2text(r->min, nullptr, 10, 0));
+        debug_printf("    known0s:  %s\n", int2text(r->known0, nullptr, 10, 0));
+        debug_printf("    known1s:  %s\n", int2text(r->known1, nullptr, 10, 0));
+    }
+}
+
 } // namespace
 
 void propagate_SSA_constants(int passes) {
@@ -415,5 +477,7 @@ void propagate_SSA_constants(int passes) {
         any |= has_changed;
         if (!has_changed && i > 1) break;
     }
+    if (passes >= MOST_PASSES && propagation.name_bounded_values()) any = true;
+    if (print_debug) dump_widened_symbol_entries();
     if (any) changed(fact::graph | fact::alias_marks);
 }

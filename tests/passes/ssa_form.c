@@ -152,6 +152,21 @@ int outer_and_inner(struct box* p, int d) {
     return s;
 }
 
+// A value of few numbers has a name, and what is known of it is known in every block.
+// FUNCTION: bounded
+// NOT: > 9
+int bounded(int a, int n) {
+    int s = 0, k, i;
+    for (i = 0; i < n; i++) {
+        k = many[i] & 7;
+        if (a > i) s += k;
+        else s -= 2 * k;
+        if (seen == i && k > 9) return s;
+        s ^= i;
+    }
+    return s;
+}
+
 int main(void) {
     struct box small = {2, 3};
     put_i16(chain(1) * 10 + chain(0));
@@ -165,6 +180,6 @@ int main(void) {
     put_i16(changed_in_loop(&small, &small.limit, 5));
     seen = 0;
     put_i16(guarded(3, 0, 0, &box)), put_i16(guarded(9, 2, &box, &box));
-    put_i16(stopped(9, 0) + 1), put_i16(outer_and_inner(&box, 3)), put_i16(seen);
+    put_i16(bounded(3, 8)), put_i16(stopped(9, 0) + 1), put_i16(outer_and_inner(&box, 3)), put_i16(seen);
     return 0;
 }

@@ -143,7 +143,8 @@ public:
         const NODE* first = currfuninfo->bb_list->statements->first;
         for (BBLK* bb : loop->contents)
             if (bb->loop == loop)
-                for (const LIST* s = bb->statements; s; s = s->rest) scan(bb, s->first, first, altered);
+                for (const LIST* s = bb->statements; s; s = s->rest)
+                    scan(bb, s->first, bb == currfuninfo->bb_list ? first : nullptr, altered);
         std::vector<SYMTAB*> ivs;
         for (SYMTAB* sym : in_order)
             if (!altered.count(sym)) ivs.push_back(sym);

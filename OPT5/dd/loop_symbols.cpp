@@ -89,6 +89,7 @@ void add_RC_candidate(SYMTAB* sym, struct LOOP* loop) {
 class CLASSIFIER {
 public:
     explicit CLASSIFIER(struct LOOP* of) : loop(of) {}
+    // `first`: the first statement of the entry block, for statements of that; null for others.
     void scan(const NODE* statement, const NODE* first) {
         const bool is_prolog = tree_is_extended_arg_prolog(statement, first);
         walk(statement, false);
@@ -175,7 +176,8 @@ void find_region_constants(struct LOOP* top) {
             if (bb->loop != loop)
                 take_over_symbols(loop, bb->loop);
             else
-                for (const LIST* s = bb->statements; s; s = s->rest) classifier.scan(s->first, first);
+                for (const LIST* s = bb->statements; s; s = s->rest)
+                    classifier.scan(s->first, bb == currfuninfo->bb_list ? first : nullptr);
         }
         if (loop->has(LOOP_has_call)) {
             keep_own_symbols(loop->RC_syms);

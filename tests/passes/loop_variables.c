@@ -130,7 +130,20 @@ int unsigned_counter(void) {
     return s;
 }
 
+// A copy of a parameter changes the variable wherever it is not the first thing that the function does.
+unsigned bounded_anew(int n) {
+    unsigned u = 0;
+    int v = g[0];
+    while (u < (unsigned)(v & 15)) {
+        v = n;
+        u++;
+    }
+    return u;
+}
+
 int main(void) {
+    g[0] = 9;
+    put_u32(bounded_anew(1)), put_u32(bounded_anew(4));
     put_i32(carried(3));
     put_i32(narrowed());
     put_i32(too_far());

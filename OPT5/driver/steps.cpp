@@ -290,7 +290,7 @@ const ROW steps[] = {
     /* 75 */ {F, "lcp", nullptr, L1, [] { copyprop(1); }, none, graph},
     /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, graph},
     /* 77 */ {F, "lcse", nullptr, L1, lcse, alias, graph},
-    /* 78 */ {L, "propagate increments", nullptr, L1, propagate_increments, none, none},
+    /* 78 */ {F, "propagate increments", nullptr, L1, propagate_increments, alias_marks, graph},
     /* 79 */ {L, "Disguise Vectors", nullptr, always, disguise_vector_operations, none, none},
     /* 80 */ {L, "late LIR", nullptr, always, late_LIR, none, none},
     // 81, "output function", belongs to the function loop.

@@ -2,7 +2,8 @@
 //
 // The rows take back what only the optimizer wants (operators in place of built-ins, scaled subscripts spelled out) and
 // settle what the output states of the function as it stands (registers, layout, exception table). The order is part of
-// their contract: no row behind "unsimplify" simplifies.
+// their contract: no row behind "unsimplify" simplifies. Between the two rows for increments, pointers are stepped by
+// statements: what removes dead ones, and the analysis of loops, reads those.
 #include "OPT5/driver/driver.h"
 #include "OPT5/driver/frames.h"
 #include "OPT5/driver/pipeline.h"
@@ -16,6 +17,7 @@
 #include "OPT5/mvp/mvp.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
+#include "OPT5/scalar/increments.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/target/target.h"
@@ -26,6 +28,7 @@ namespace {
 bool is_written() { return !TEST_FLAG(currfuninfo, FUN_is_suppressed); }
 
 constexpr ROW::KIND F = ROW::FUNCTION, FIXED = ROW::FIXED, IDLE = ROW::IDLE;
+using fact::alias_marks;
 using fact::graph;
 using fact::live_variables;
 using fact::none;
@@ -40,9 +43,11 @@ const ROW rows[] = {
     {F,     "lower addresses",        nullptr, always, lower_addresses, none, graph},
     {F,     "assignments into tests", nullptr, always, propagate_assignments_into_tests, live_variables, graph},
     {F,     "allocate registers",     nullptr, always, allocate_regs, none, graph},
+    {F,     "spell out increments",   nullptr, always, spell_out_increments, alias_marks, graph | alias_marks},
     {F,     "last dead assignments",  nullptr, always, [] { elim_dead_assigns(0, 0); }, live_variables, graph},
     {F,     "clear bits at once",     nullptr, is_written, fold_ANDBASGs, none, graph},
     {F,     "dependence for output",  nullptr, is_written, do_dd_analysis_for_be, none, graph},
+    {F,     "increments again",       nullptr, is_written, propagate_increments_again, alias_marks, graph},
     {F,     "last simpcfg",           nullptr, is_written, [] { simpcfg(1, 0); }, none, graph},
     {F,     "rotate loops",           nullptr, is_written, rotate_loops, none, graph},
     {F,     "straighten traces",      nullptr, is_written, straighten_traces_in_cfg, none, graph},

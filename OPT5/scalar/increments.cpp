@@ -1,4 +1,555 @@
-// Not built yet: the passes leave the program as it is, and every question is answered with "not known".
+// Pointer steps become part of the memory references beside them, which step address registers for free.
+//
+// A step `p += c` goes back to the last reference through p, `x = *p; p += 1` to `x = *p++`, also from behind a branch
+// that does not concern p; or forward to the next one, `p -= 1; x = *p` to `x = *(p -= 1)`; or around the back edge of
+// a loop to its first reference, `do x = *p; while (.. p -= 1 ..)`, where p is then moved ahead of the loop by as much.
+//
+// Needs: alias marks, embedded assignments promoted. Leaves: the graph, but for exits of loops that it splits.
+// Sound because p is a variable that only its name reaches and that no clean-up code names, and the step moves over
+// what does not name p, to a reference that is evaluated exactly as often as the step, as the only use of p in its
+// statement: not behind `&&`, `||` or in an arm of a choice, and in a block that is reached exactly when the block of
+// the step is. A step does not pass a statement that an exception may leave: `catch` may read p.
 #include "OPT5/scalar/increments.h"
 
-void propagate_increments() {}
+#include "OPT5/alias/effects.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/symtab.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
+#include "OPT5/scalar/eda.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
+
+#include <algorithm>
+#include <vector>
+
+namespace {
+
+constexpr int MOST_BLOCKS_BACK = 10; // by number, between a step and its reference
+constexpr int MOST_BLOCKS_FORWARD = 5;
+constexpr int MOST_STATEMENTS = 256; // that one step looks at
+constexpr int MOST_SPLIT_EXITS = 8;  // of loops; each asks for the graph's facts again
+
+// p = p + c, in units of 16 bits.
+struct STEP {
+    SYMTAB* p = nullptr;
+    long c = 0;
+};
+
+bool is_number(const NODE* t, long* value) {
+    if (t->op != ICON || !t->u.lval.fits<int32_t>()) return false;
+    *value = t->u.lval.fits_in<int32_t>();
+    return true;
+}
+
+// NAME p + c or NAME p - c.
+bool is_sum(const NODE* t, const SYMTAB* p, long* c) {
+    if ((t->op != PLUS && t->op != MINUS) || !t->type->is_pointer()) return false;
+    if (t->left->op != NAME || t->left->u.sym != p || !is_number(t->right, c)) return false;
+    if (t->op == MINUS) *c = -*c;
+    return true;
+}
+
+bool read_step(const NODE* t, STEP* step) {
+    if (!t || !t->left || t->left->op != NAME || !t->type->is_pointer()) return false;
+    *step = {t->left->u.sym, 0};
+    switch (t->op) {
+    case ASG: return compatible_types(t->left->type, t->right->type, true) && is_sum(t->right, step->p, &step->c);
+    case PLUSASG:
+    case PLUSPLUS: return is_number(t->right, &step->c);
+    case MINUSASG:
+    case MINMIN:
+        if (!is_number(t->right, &step->c)) return false;
+        step->c = -step->c;
+        return true;
+    default: return false;
+    }
+}
+
+bool is_in_register(const SYMTAB* p, bool forward) {
+    if (p->sclass != SC_AUTO && (forward || p->sclass != SC_REGISTER2)) return false;
+    return only_its_name_reaches(p) && !p->type->is_volatile() && !sym_appears_in_EHT(p);
+}
+
+bool is_power_of_two(long c) { return c > 0 && (c & (c - 1)) == 0; }
+
+// ---- The search for a reference
+
+enum DIRECTION : uint8_t { BACKWARD, FORWARD };
+
+struct USE {
+    enum KIND : uint8_t { NONE, BLOCKED, HIT } kind = NONE;
+    NODE* umult = nullptr;
+};
+
+class SEARCH {
+public:
+    SEARCH(const STEP& step, DIRECTION direction) : step(step), direction(direction) {}
+
+    USE of(NODE* t, bool is_conditional = false) const {
+        if (!t) return {};
+        switch (t->op) {
+        case NAME: return t->u.sym == step.p ? USE{USE::BLOCKED, nullptr} : USE{};
+        case ANDAND:
+        case OROR: return both(of(t->left, is_conditional), of(t->right, true));
+        case QUEST: return both(of(t->left, is_conditional), of(t->right, true));
+        case IF:
+        case SWITCH: return of(t->left, is_conditional);
+        case UAND: return without_hit(of(t->left, is_conditional)); // an address, no access
+        case UMULT:
+            if (!t->right && absorbs(t)) return is_conditional ? USE{USE::BLOCKED, nullptr} : USE{USE::HIT, t};
+            break;
+        default: break;
+        }
+        return both(of(t->left, is_conditional), of(t->right, is_conditional));
+    }
+
+private:
+    static USE without_hit(USE u) {
+        if (u.kind == USE::HIT) u = {USE::BLOCKED, nullptr};
+        return u;
+    }
+
+    static USE both(USE a, USE b) {
+        if (a.kind == USE::NONE) return b;
+        if (b.kind == USE::NONE) return a;
+        return {USE::BLOCKED, nullptr};
+    }
+
+    bool absorbs(const NODE* umult) const {
+        const NODE* address = umult->left;
+        long offset = 0;
+        const bool is_plain = address->op == NAME && address->u.sym == step.p;
+        if (!is_plain && !is_sum(address, step.p, &offset)) return false;
+        const bool fits = direction == BACKWARD ? (is_plain ? step.c > 0 : offset == step.c)
+                                                : (is_plain ? step.c < 0 : offset == -step.c);
+        return fits && has_size_of_step(umult->type);
+    }
+
+    bool has_size_of_step(const TYPE* t) const {
+        const uint64_t bits = static_cast<uint64_t>(step.c < 0 ? -step.c : step.c) * 16;
+        if (t->size == bits) return true;
+        return !t->is_pointer() && !t->is_vector() && type_stride(t) == bits;
+    }
+
+    const STEP step;
+    const DIRECTION direction;
+};
+
+// ---- The pass
+
+class INCREMENTS {
+public:
+    explicit INCREMENTS(bool again) : again(again) {}
+    void run();
+    bool moved_around() const { return is_around; }
+
+private:
+    void list_blocks();
+    void sweep_backward(BBLK* bb);
+    bool moves_backward(size_t at, BBLK* bb, NODE* tree, const STEP& step);
+    bool search_before(std::vector<LIST*>& cells, size_t end, const STEP& step, NODE* tree, bool* stop);
+    std::vector<LIST*>& cells_of(const BBLK* bb);
+    static BBLK* block_in_front(const BBLK* bb, const SYMTAB* p);
+    void sweep_forward(BBLK* bb);
+    bool moves_forward(BBLK* bb, LIST* cell, const STEP& step);
+    USE search_from(BBLK* bb, LIST* cell, const STEP& step, int budget, BBLK** end);
+    BBLK* block_behind(const std::vector<BBLK*>& seen, int* budget) const;
+    bool moves_around(BBLK* latch, LIST* cell, const STEP& step);
+
+    static void absorb_backward(NODE* umult, NODE* tree, const STEP& step);
+    static void absorb_forward(NODE* umult, NODE* tree, const STEP& step);
+    static bool split_assignment(LIST* cell, const STEP& step, NODE** umult);
+
+    const bool again;
+    std::vector<BBLK*> blocks;             // by number
+    std::vector<std::vector<LIST*>> cells; // by number, of blocks that were looked at; empty: not known
+    int statements_left = 0;
+    bool is_around = false;
+    bool has_new_temps = false;
+    int split_exits = 0;
+};
+
+NODE* mk_step(int op, SYMTAB* p, long c) {
+    NODE* name = mk_NAME(p);
+    return maketree(op, name, mk_ICON(c, tp->long_t), p->type->stqs());
+}
+
+NODE* post_step(const STEP& s) { return s.c < 0 ? mk_step(MINMIN, s.p, -s.c) : mk_step(PLUSPLUS, s.p, s.c); }
+NODE* plain_step(SYMTAB* p, long c) { return c < 0 ? mk_step(MINUSASG, p, -c) : mk_step(PLUSASG, p, c); }
+
+void set_address(NODE* umult, NODE* address) {
+    erase_tree(umult->left);
+    umult->left = address;
+}
+
+// The tree of the step is taken over or erased.
+void INCREMENTS::absorb_backward(NODE* umult, NODE* tree, const STEP& step) {
+    const bool is_plain = umult->left->op == NAME;
+    set_address(umult, is_plain ? post_step(step) : copy_tree(tree));
+    erase_tree(tree);
+}
+
+void INCREMENTS::absorb_forward(NODE* umult, NODE* tree, const STEP& step) {
+    const bool is_plain = umult->left->op == NAME;
+    set_address(umult, is_plain ? copy_tree(tree) : post_step(step));
+    erase_tree(tree);
+}
+
+// `*p = f(p)` becomes `t = f(p); *p = t`, so that the step behind it has the reference for itself.
+bool INCREMENTS::split_assignment(LIST* cell, const STEP& step, NODE** umult) {
+    NODE* t = cell->first;
+    if (t->op != ASG || !t->type->is_scalar() || t->right->type->is_bool()) return false;
+    const USE target = SEARCH(step, BACKWARD).of(t->left);
+    if (target.kind != USE::HIT) return false;
+    bool writes = false;
+    for_each_written_name(t->right, [&](const NODE* name, const NODE*) { writes |= name->u.sym == step.p; });
+    if (writes || (cell->rest && tree_is_EH_SWITCH(cell->rest->first))) return false;
+    SYMTAB* temp = sym_temp('A', -1, t->right->type->stqs(), nullptr);
+    NODE* store = maketree(ASG, t->left, mk_NAME(temp), t->type, t->ls);
+    t->left = mk_NAME(temp);
+    t->type = temp->type;
+    insert_behind(cell, store, cell->psn);
+    *umult = target.umult;
+    return true;
+}
+
+// ---- Backward
+
+// Over the statements in front of `end`, nearest first. `*stop`: one of them concerns p.
+bool INCREMENTS::search_before(std::vector<LIST*>& cells, size_t end, const STEP& step, NODE* tree, bool* stop) {
+    const SEARCH search(step, BACKWARD);
+    for (size_t i = end; i-- > 0;) {
+        if (--statements_left < 0) break;
+        LIST* cell = cells[i];
+        USE use = search.of(cell->first);
+        if (use.kind == USE::NONE) continue;
+        if (use.kind == USE::BLOCKED && !again && split_assignment(cell, step, &use.umult)) {
+            cells.insert(cells.begin() + static_cast<long>(i) + 1, cell->rest);
+            use.kind = USE::HIT;
+            has_new_temps = true;
+        }
+        *stop = true;
+        if (use.kind == USE::BLOCKED) return false;
+        absorb_backward(use.umult, tree, step);
+        return true;
+    }
+    *stop = statements_left < 0;
+    return false;
+}
+
+std::vector<LIST*>& INCREMENTS::cells_of(const BBLK* bb) {
+    std::vector<LIST*>& found = cells[static_cast<size_t>(bb->dfn)];
+    if (found.empty())
+        for (LIST* s = bb->statements; s; s = s->rest) found.push_back(s);
+    return found;
+}
+
+bool names(const BBLK* bb, const SYMTAB* p) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (sym_appears_in_tree(p, s->first)) return true;
+    return false;
+}
+
+const BBLK* only(const EDGE* list) { return list && !list->rest ? list->first : nullptr; }
+bool has_two(const EDGE* list) { return list && list->rest && !list->rest->rest; }
+
+// The block from which control comes to this one whatever a branch in between decides, which does not concern p.
+BBLK* INCREMENTS::block_in_front(const BBLK* bb, const SYMTAB* p) {
+    if (!has_two(bb->predecessors)) return nullptr;
+    BBLK *a = bb->predecessors->first, *b = bb->predecessors->rest->first;
+    if (a->dfn > b->dfn) std::swap(a, b);
+    if (b->dfn >= bb->dfn || only(b->successors) != bb || names(b, p)) return nullptr;
+    BBLK* front = a;
+    if (only(a->successors) == bb) { // if-else
+        if (names(a, p) || !only(a->predecessors) || only(a->predecessors) != only(b->predecessors)) return nullptr;
+        front = a->predecessors->first;
+        if (front->dfn >= a->dfn || !has_two(front->successors)) return nullptr;
+    } else if (only(b->predecessors) != a || !has_two(a->successors))
+        return nullptr;
+    return front->branch() && front->branch()->op == IF ? front : nullptr;
+}
+
+// The step is, or is in, statement `at` of the block.
+bool INCREMENTS::moves_backward(size_t at, BBLK* bb, NODE* tree, const STEP& step) {
+    if (!again && !is_power_of_two(step.c < 0 ? -step.c : step.c)) return false;
+    statements_left = MOST_STATEMENTS;
+    bool stop = false;
+    for (BBLK* in = bb;;) {
+        if (search_before(cells_of(in), at, step, tree, &stop)) return true;
+        if (stop) return false;
+        BBLK* front = in == blocks.front() ? nullptr : block_in_front(in, step.p);
+        if (!front || bb->dfn - front->dfn > MOST_BLOCKS_BACK) return false;
+        in = front;
+        at = cells_of(in).size();
+    }
+}
+
+void INCREMENTS::sweep_backward(BBLK* bb) {
+    for (size_t i = cells_of(bb).size(); i-- > 0;) {
+        LIST* cell = cells_of(bb)[i]; // a split adds one in front
+        NODE* t = cell->first;
+        STEP step;
+        if (read_step(t, &step) && is_in_register(step.p, false)) {
+            if (moves_backward(i, bb, t, step)) cell->first = nullptr;
+            continue;
+        }
+        // x = (p = p + c)
+        const bool is_embedded = t->op == ASG && t->left->op == NAME && read_step(t->right, &step) &&
+                                 t->right->op != PLUSPLUS && t->right->op != MINMIN && is_in_register(step.p, true);
+        if (!is_embedded || t->left->u.sym == step.p) continue;
+        if (moves_backward(i, bb, t->right, step)) t->right = mk_NAME(step.p);
+    }
+    cells[static_cast<size_t>(bb->dfn)].clear();
+    drop_empty_cells(&bb->statements);
+}
+
+// ---- Forward
+
+// The block behind those seen, all of which lead to it and nowhere else in the end; null if there is none.
+BBLK* INCREMENTS::block_behind(const std::vector<BBLK*>& seen, int* budget) const {
+    const BBLK* last = seen.back();
+    const size_t next = static_cast<size_t>(last->dfn); // numbers begin at 1
+    if (*budget <= 0 || next >= blocks.size()) return nullptr;
+    BBLK* bb = blocks[next];
+    int farthest = 0;
+    for (const EDGE* e = last->successors; e; e = e->rest) {
+        if (e->first->dfn <= last->dfn) return nullptr;
+        farthest = std::max(farthest, e->first->dfn);
+    }
+    if (!edge_memberp(bb, last->successors) || farthest - last->dfn > *budget) return nullptr;
+    for (const EDGE* e = bb->predecessors; e; e = e->rest)
+        if (e->first->dfn < seen.front()->dfn || e->first->dfn > last->dfn) return nullptr;
+    --*budget;
+    return bb;
+}
+
+// From `cell` on, over blocks that are reached from here alone. A hit lies in a block that control comes to whatever is
+// decided in between. `*end`: the block at whose end the search found nothing; null if it ended before.
+USE INCREMENTS::search_from(BBLK* bb, LIST* cell, const STEP& step, int budget, BBLK** end) {
+    const SEARCH search(step, FORWARD);
+    std::vector<BBLK*> seen{bb};
+    int farthest = bb->dfn; // that a block seen leads to
+    *end = nullptr;
+    for (;;) {
+        for (; cell; cell = cell->rest) {
+            if (--statements_left < 0) return {USE::BLOCKED, nullptr};
+            const USE use = search.of(cell->first);
+            const bool may_be_left =
+                tree_is_EH_SWITCH(cell->first) || (cell->rest && tree_is_EH_SWITCH(cell->rest->first));
+            if (may_be_left || use.kind == USE::BLOCKED) return {USE::BLOCKED, nullptr};
+            if (use.kind == USE::HIT) return farthest <= seen.back()->dfn ? use : USE{USE::BLOCKED, nullptr};
+        }
+        for (const EDGE* e = seen.back()->successors; e; e = e->rest) farthest = std::max(farthest, e->first->dfn);
+        BBLK* next = block_behind(seen, &budget);
+        if (!next) {
+            if (farthest <= seen.back()->dfn || seen.size() == 1) *end = seen.back();
+            return {};
+        }
+        seen.push_back(next);
+        cell = next->statements;
+    }
+}
+
+bool INCREMENTS::moves_forward(BBLK* bb, LIST* cell, const STEP& step) {
+    statements_left = MOST_STATEMENTS;
+    BBLK* end = nullptr;
+    const USE use = search_from(bb, cell->rest, step, MOST_BLOCKS_FORWARD, &end);
+    if (use.kind == USE::HIT) {
+        absorb_forward(use.umult, cell->first, step);
+        return true;
+    }
+    return use.kind == USE::NONE && end && !again && moves_around(end, cell, step);
+}
+
+// ---- Around a back edge
+
+// p is moved by -c where the loop is entered.
+void set_back(BBLK* preheader, const STEP& step) {
+    LIST* last = nullptr;
+    for (LIST* s = preheader->statements; s; s = s->rest)
+        if (sym_appears_in_tree(step.p, s->first)) last = s;
+    NODE* t = last ? last->first : nullptr;
+    if (t && t->op == ASG && t->left->op == NAME && t->left->u.sym == step.p && t->right->type->is_pointer() &&
+        !tree_is_arg_prolog(t)) {
+        t->right = simp_tree(maketree(MINUS, t->right, mk_ICON(step.c, tp->long_t), t->right->type), nullptr);
+        return;
+    }
+    insert_at_end_of_body(preheader, plain_step(step.p, -step.c));
+}
+
+// Behind the loop p is what it was: the step is made there, with the next one if that comes first.
+void step_behind(BBLK* exit, const NODE* tree, const STEP& step, PSN* psn) {
+    for (LIST** link = &exit->statements; *link; link = &(*link)->rest) {
+        LIST* cell = *link;
+        if (!sym_appears_in_tree(step.p, cell->first)) continue;
+        STEP next;
+        if (!read_step(cell->first, &next) || next.p != step.p) break;
+        if (next.c + step.c == 0) return drop_statement(link);
+        erase_tree(cell->first);
+        cell->first = plain_step(step.p, next.c + step.c);
+        return;
+    }
+    insert_before(&exit->statements, copy_tree(tree), psn);
+}
+
+bool INCREMENTS::moves_around(BBLK* latch, LIST* cell, const STEP& step) {
+    if (!has_two(latch->successors) || ends_in_promise(latch)) return false;
+    BBLK *header = latch->successors->first, *exit = latch->successors->rest->first;
+    if (header->dfn > latch->dfn) std::swap(header, exit);
+    if (header->dfn > latch->dfn || header == blocks.front() || !has_two(header->predecessors)) return false;
+    BBLK* preheader = header->predecessors->first;
+    if (preheader == latch) preheader = header->predecessors->rest->first;
+    need(fact::loops);
+    const NATURAL_LOOPS& loops = *currfuninfo->loops;
+    const NATURAL_LOOP* loop = loops.around(header);
+    if (!loop || loop->header != header || preheader == latch || only(preheader->successors) != header) return false;
+    if (loops.contains(loop, exit) || loops.contains(loop, preheader)) return false;
+    if (exit->predecessors->rest && split_exits >= MOST_SPLIT_EXITS) return false;
+    BBLK* end = nullptr;
+    const USE use = search_from(header, header->statements, step, MOST_BLOCKS_FORWARD + 1, &end);
+    if (use.kind != USE::HIT) return false;
+    if (print_debug)
+        debug_printf("\n\tBB->DFN [%d-%d] with pre-header %d and exit %d\n"
+                     "\tAssignment propagated around back edge of loop: %s\n"
+                     "\t(Original assignment has not yet been removed.)\n",
+                     header->dfn, latch->dfn, preheader->dfn, exit->dfn, tree_to_infix(cell->first).c_str());
+    if (exit->predecessors->rest) {
+        exit = split_cfg_edge(latch, exit);
+        ++split_exits;
+        renumber_bblocks();
+        list_blocks();
+        changed(fact::alias_marks);
+    }
+    step_behind(exit, cell->first, step, cell->psn);
+    set_back(preheader, step);
+    absorb_forward(use.umult, cell->first, step);
+    is_around = true;
+    return true;
+}
+
+void INCREMENTS::sweep_forward(BBLK* bb) {
+    for (LIST** link = &bb->statements; (*link)->rest;) {
+        STEP step;
+        const bool is_step = read_step((*link)->first, &step) && is_in_register(step.p, !again);
+        if (is_step && moves_forward(bb, *link, step)) {
+            (*link)->first = nullptr;
+            drop_statement(link);
+        } else
+            link = &(*link)->rest;
+    }
+}
+
+void INCREMENTS::list_blocks() {
+    blocks.clear();
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
+}
+
+void INCREMENTS::run() {
+    list_blocks();
+    cells.resize(blocks.size() + 1);
+    for (size_t i = blocks.size(); i-- > 0;) sweep_backward(blocks[i]);
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) sweep_forward(bb);
+    if (has_new_temps) sym_split(currfuninfo);
+    changed(split_exits ? fact::none : fact::graph);
+}
+
+// ---- The reverse
+
+// A reference with a step that may be spelled out.
+bool has_own_step(const NODE* umult, STEP* step) {
+    if (umult->op != UMULT || umult->right || umult->left->op == NAME) return false;
+    return read_step(umult->left, step) && only_its_name_reaches(step->p);
+}
+
+struct FOLDED {
+    NODE* umult;
+    STEP step;
+};
+
+int count_of(const SYMTAB* p, const NODE* t) {
+    int count = 0;
+    for_each_subtree(t, [&](const NODE* n) { count += n->op == NAME && n->u.sym == p; });
+    return count;
+}
+
+// Those of a statement that are evaluated whenever it is, and whose pointer nothing else in it reads.
+void find_folded(NODE* t, const NODE* statement, std::vector<FOLDED>& found) {
+    if (!t) return;
+    STEP step;
+    if (has_own_step(t, &step)) {
+        const int own = t->left->op == ASG ? 2 : 1;
+        if (count_of(step.p, statement) == own) found.push_back({t, step});
+        return;
+    }
+    find_folded(t->left, statement, found);
+    const bool is_conditional = t->op == ANDAND || t->op == OROR || t->op == QUEST;
+    if (!is_conditional && t->op != IF && t->op != SWITCH) find_folded(t->right, statement, found);
+}
+
+// `x = *(p += c)` becomes `x = *(p + c); p += c`. Where nothing can follow the statement the step is made ahead of it.
+void spell_out(const FOLDED& f, LIST** link, LIST* cell, bool nothing_follows) {
+    const bool is_post = f.umult->left->op == PLUSPLUS || f.umult->left->op == MINMIN;
+    NODE* address = mk_NAME(f.step.p);
+    if (is_post == nothing_follows) {
+        const long offset = is_post ? -f.step.c : f.step.c;
+        address = maketree(PLUS, address, mk_ICON(offset, tp->long_t), f.step.p->type->stqs());
+    }
+    set_address(f.umult, address);
+    NODE* step = plain_step(f.step.p, f.step.c);
+    if (nothing_follows)
+        insert_before(link, step, cell->psn);
+    else
+        insert_behind(cell, step, cell->psn);
+}
+
+void spell_out_in(BBLK* bb) {
+    std::vector<FOLDED> found;
+    for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
+        LIST* cell = *link;
+        found.clear();
+        find_folded(cell->first, cell->first, found);
+        const bool nothing_follows =
+            cell == bb->last_statement() || (cell->rest && tree_is_EH_SWITCH(cell->rest->first));
+        for (const FOLDED& f : found) {
+            spell_out(f, link, cell, nothing_follows);
+            while (*link != cell) link = &(*link)->rest;
+        }
+    }
+}
+
+// Of those behind loops. What removes dead assignments makes statements of embedded ones.
+void remove_dead_steps() {
+    spell_out_increments();
+    need(fact::live_variables);
+    elim_dead_assigns(0, 0);
+    need(fact::alias_marks);
+    renumber_bblocks();
+    INCREMENTS(true).run();
+}
+
+void run(bool again) {
+    if (opt_level() < 1 || !currfuninfo || !currfuninfo->bb_list) return;
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'propagate_increments' --------\n");
+    renumber_bblocks();
+    INCREMENTS increments(again);
+    increments.run();
+    if (increments.moved_around()) remove_dead_steps();
+    if (print_debug) debug_printf("\n\n\t\t\t---------- EXITING 'propagate_increments' --------\n");
+}
+
+} // namespace
+
+void propagate_increments() { run(false); }
+void propagate_increments_again() { run(true); }
+
+void spell_out_increments() {
+    if (opt_level() < 1) return;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) spell_out_in(bb);
+}

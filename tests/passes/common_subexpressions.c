@@ -63,7 +63,7 @@ int changed(int *p, int n) {
 }
 
 // FUNCTION: stepped_pointer
-// COUNT 2: /[*]p [*] 7/
+// COUNT 2: /[*]p(\+\+)? [*] 7/
 int stepped_pointer(int *p) {
     int x = *p * 7 + 1;
     p++;

@@ -7,8 +7,7 @@ long m[8][8], w[64];
 
 // The test is on the pointer: it meets its end exactly, also where the loop does not run.
 // FUNCTION: dot
-// HAS: s += *$O$P0 * *$O$P1
-// HAS: $O$P0 += 1
+// HAS: s += *$O$P0++ * *$O$P1++
 // NOT: i
 // HAS: if (!($O$P0 == $O$P2)) goto L2
 // COUNT 0: n > 0 ? x + n : x

@@ -82,6 +82,8 @@ int PRINTER::precedence(const IC_NODE* t) {
     case QUEST: return prec_quest;
     case SCONV:
     case PCONV: return prec_unary;
+    case PLUSPLUS:
+    case MINMIN:
     case STDOT:
     case STREF:
     case CALL:
@@ -130,6 +132,15 @@ void PRINTER::plain(const IC_NODE* t, int) {
         expr(t->right->left, prec_quest + 1);
         text += " : ";
         return expr(t->right->right, prec_quest);
+    case PLUSPLUS: // a step other than 1 is shown behind
+    case MINMIN:
+        expr(t->left, prec_postfix);
+        text += t->op == PLUSPLUS ? "++" : "--";
+        if (!t->right || (t->right->op == ICON && t->right->value == 1)) return;
+        text += '{';
+        expr(t->right, 0);
+        text += '}';
+        return;
     case SCONV:
     case PCONV:
         text += '(';

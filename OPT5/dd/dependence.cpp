@@ -56,13 +56,13 @@ void init_dependence_analysis() {
 void redo_dependence_analysis(struct LOOP*) {
     if (!dependence_analysis_enabled) return;
     flush_DDEPNODEs_for_loop(loop_root());
-    forget_trip_limits();
+    forget_facts_for_references();
     make_references(loop_root());
 }
 
 void wrapup_dependence_analysis(bool keep) {
     if (!keep && dependence_analysis_enabled && loop_root()) flush_DDEPNODEs_for_loop(loop_root());
-    forget_trip_limits();
+    forget_facts_for_references();
     dependence_analysis_enabled = false;
 }
 

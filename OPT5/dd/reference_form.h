@@ -8,6 +8,7 @@
 #include "OPT5/simp/linear.h"
 #include "OPT5/simp/range.h"
 
+#include <memory>
 #include <vector>
 
 constexpr unsigned ADDRESS_BITS = 32;
@@ -21,6 +22,7 @@ struct TERM_FACTS {
     uint64_t levels = 0;             // the term is computed from the counts of the loops of these levels
     bool is_bounded = false;         // `range` holds
     RANGE range{0, 0};
+    WIDE modulus = 0, residue = 0; // above 0: the term is `residue` modulo that
 };
 
 struct REFERENCE final : DDEPNODE {
@@ -32,7 +34,28 @@ struct REFERENCE final : DDEPNODE {
     std::vector<NODE*> made;       // trees that the terms are; owned
 };
 
-void make_references(struct LOOP* root); // the records of all references of the function
+void make_references(struct LOOP* root); // the records of all references of the function, and what is below
+
+// What holds of a sum of integers and addresses in all iterations of a loop.
+struct GIVEN {
+    GIVEN() : sum(std::make_unique<REFERENCE>()) {}
+
+    std::unique_ptr<REFERENCE> sum; // no reference: the sum alone
+    std::vector<RANGE> ranges;      // it lies in one of these: one or two
+    WIDE modulus = 0, residue = 0;  // or, with a modulus above 0: it is `residue` modulo that
+};
+const std::vector<GIVEN>& givens_for_references(const struct LOOP* loop);
+void add_given_for_references(const struct LOOP* loop, GIVEN given);
+
+// A condition as one on a difference: `left` less `right` lies in the ranges, or is that modulo the modulus. The trees
+// are parts of the condition, `right` may be null. False where it is none.
+struct RELATION {
+    const NODE *left = nullptr, *right = nullptr;
+    std::vector<RANGE> ranges;
+    WIDE modulus = 0, residue = 0;
+};
+bool relation_of(const NODE* condition, bool holds, RELATION* r);
+constexpr WIDE FAR = WIDE(1) << 100; // of a bound: none
 
 // What an access touches behind the address of its UMULT, in address units: from `low` up to `high`.
 struct EXTENT {
@@ -43,11 +66,21 @@ struct EXTENT {
 // and subscripts are taken to be fixed where they are noted to be; `pointersAreFixed`: pointers in all loops.
 DDEP_PTR narrow_by_addresses(DDEP_PTR v, const REFERENCE& a, EXTENT ea, const REFERENCE& b, EXTENT eb,
                              struct LOOP* common, bool pointersAreFixed);
+// The same by what relates the terms: givens, bounds of loops by counts of others, products with an invariant. `low`
+// and `high` are the differences of the two addresses at which the accesses overlap.
+DDEP_PTR narrow_by_givens(DDEP_PTR v, const REFERENCE& a, const REFERENCE& b, struct LOOP* common, int64_t low,
+                          int64_t high, bool pointersAreFixed);
+void allow_work_on_givens(); // as much as an analysis may spend on it
+// Whether the term is fixed between two references whose iterations may differ from loop `in` on.
+bool term_is_fixed(const TERM_FACTS& f, const NODE* term, const struct LOOP* in, bool pointersAreFixed);
+// The loop in which a value must be fixed to be the same for both references: outside of it the iterations are the
+// same.
+struct LOOP* loop_of_differences(const DDEP& v, struct LOOP* common);
 
 // While the analysis is active, more than `maxTrips` may be known of a loop.
 void limit_trips(const struct LOOP* loop, WIDE most);
-void forget_trip_limits();
+void forget_facts_for_references(); // these limits, and the givens
 WIDE last_iteration(const struct LOOP* loop); // the greatest count of iterations at any point in it; NO_LAST: not known
-constexpr WIDE NO_LAST = WIDE(1) << 100;
+constexpr WIDE NO_LAST = FAR;
 // The loop around `loop`, or itself, of that level.
 struct LOOP* loop_of_level(struct LOOP* loop, int level);

@@ -31,7 +31,15 @@ struct LOOP* loop_of_level(struct LOOP* loop, int level) {
 static thread_local std::unordered_map<const struct LOOP*, WIDE> trip_limits; // looked up alone
 
 void limit_trips(const struct LOOP* loop, WIDE most) { trip_limits[loop] = most; }
-void forget_trip_limits() { trip_limits.clear(); }
+static thread_local std::unordered_map<const struct LOOP*, std::vector<GIVEN>> givens; // looked up alone
+
+const std::vector<GIVEN>& givens_for_references(const struct LOOP* loop) { return givens[loop]; }
+void add_given_for_references(const struct LOOP* loop, GIVEN given) { givens[loop].push_back(std::move(given)); }
+
+void forget_facts_for_references() {
+    trip_limits.clear();
+    givens.clear();
+}
 
 // The count of an iteration that is left before its tail is one more than those that are executed to their ends.
 WIDE last_iteration(const struct LOOP* loop) {
@@ -46,7 +54,6 @@ WIDE last_iteration(const struct LOOP* loop) {
 
 namespace {
 
-constexpr WIDE FAR = NO_LAST; // of a bound: none
 constexpr int MOST_DIFFERENCES = 64, MOST_ROUNDS = 3;
 
 WIDE gcd_of(WIDE a, WIDE b) {
@@ -212,8 +219,8 @@ public:
     EQUATION(const REFERENCE& x, const REFERENCE& y, struct LOOP* c, struct LOOP* in, bool fixed_pointers)
         : common(c), fixed(in), pointersAreFixed(fixed_pointers), levels(static_cast<size_t>(c->level) + 1) {
         for (struct LOOP* l = common; l; l = l->parent) levels[static_cast<size_t>(l->level)].last = last_iteration(l);
-        enter(x, y);
         constant = WIDE(x.sum.constant) - y.sum.constant;
+        enter(x, y);
         if (!x.sum.is_exact || !y.sum.is_exact) unknowns.push_back({WIDE(1) << ADDRESS_BITS, -FAR, FAR});
     }
 
@@ -241,16 +248,24 @@ public:
 private:
     // ---- Setting up
 
-    bool is_fixed(const TERM_FACTS& f, const NODE* t) const {
-        if (pointersAreFixed && t->type->is_pointer()) return true;
-        return f.fixed_in && f.fixed_in->level <= fixed->level;
-    }
+    bool is_fixed(const TERM_FACTS& f, const NODE* t) const { return term_is_fixed(f, t, fixed, pointersAreFixed); }
     bool is_common(const struct LOOP* l) const {
         return l->level <= common->level && loop_of_level(common, l->level) == l;
     }
     static UNKNOWN unknown(WIDE by, const TERM_FACTS& f) {
         if (f.counts) return {by, 0, last_iteration(f.counts)};
         return f.is_bounded ? UNKNOWN{by, f.range.min, f.range.max} : UNKNOWN{by, -FAR, FAR};
+    }
+    // As residue + modulus * u, where that is known.
+    void add_unknown(UNKNOWN u, const TERM_FACTS& f) {
+        if (f.modulus > 0) {
+            constant += u.by * f.residue;
+            u.by *= f.modulus;
+            if (u.low > -FAR) u.low = -floor_div(-(u.low - f.residue), f.modulus);
+            if (u.high < FAR) u.high = floor_div(u.high - f.residue, f.modulus);
+            if (u.low > u.high) u.low = -FAR, u.high = FAR; // nothing is executed where facts contradict each other
+        }
+        unknowns.push_back(u);
     }
     void enter(const REFERENCE& x, const REFERENCE& y) {
         std::vector<bool> is_matched(y.facts.size());
@@ -263,13 +278,13 @@ private:
             if (other && match(f, y.facts[j], t, other->coefficient))
                 is_matched[j] = true;
             else
-                unknowns.push_back(unknown(t.coefficient, f));
+                add_unknown(unknown(t.coefficient, f), f);
         }
         i = 0;
         for (const LINEAR_FORM::TERM& t : y.sum) {
             const size_t j = i++;
             if (!is_matched[j] && !enter_count(y.facts[j], t.coefficient, &LEVEL_TERM::b))
-                unknowns.push_back(unknown(-WIDE(t.coefficient), y.facts[j]));
+                add_unknown(unknown(-WIDE(t.coefficient), y.facts[j]), y.facts[j]);
         }
     }
     bool enter_count(const TERM_FACTS& f, int64_t k, WIDE LEVEL_TERM::*side) {
@@ -284,7 +299,7 @@ private:
         if (f.levels)
             pairs.push_back({a, b, f.levels});
         else if (a.by + b.by)
-            unknowns.push_back(joined(a, b));
+            add_unknown(joined(a, b), f);
         return true;
     }
     static UNKNOWN joined(const UNKNOWN& a, const UNKNOWN& b) { // of one value
@@ -381,15 +396,17 @@ private:
     WIDE constant = 0;
 };
 
-// The loop in which a value must be fixed to be the same for both references: outside of it the iterations are the
-// same.
+} // namespace
+
 struct LOOP* loop_of_differences(const DDEP& v, struct LOOP* common) {
     int level = 1;
     while (level < v.count() && v.dve[static_cast<size_t>(level)].has_only_SAME_dir()) ++level;
     return loop_of_level(common, std::min(level, static_cast<int>(common->level)));
 }
 
-} // namespace
+bool term_is_fixed(const TERM_FACTS& f, const NODE* term, const struct LOOP* in, bool pointersAreFixed) {
+    return (pointersAreFixed && term->type->is_pointer()) || (f.fixed_in && f.fixed_in->level <= in->level);
+}
 
 DDEP_PTR narrow_by_addresses(DDEP_PTR v, const REFERENCE& a, EXTENT ea, const REFERENCE& b, EXTENT eb,
                              struct LOOP* common, bool pointersAreFixed) {
@@ -407,5 +424,6 @@ DDEP_PTR narrow_by_addresses(DDEP_PTR v, const REFERENCE& a, EXTENT ea, const RE
         else
             all = std::move(one);
     }
-    return all;
+    if (!all || !a.sum.is_exact || !b.sum.is_exact) return all;
+    return narrow_by_givens(std::move(all), a, b, common, eb.low - ea.high + 1, eb.high - ea.low - 1, pointersAreFixed);
 }

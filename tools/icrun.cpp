@@ -16,6 +16,7 @@ const char help[] =
     "  --check          asserted conditions and promised trip counts of loops are checked, that loop records are of\n"
     "                   the loops that there are, and that each two accesses that meet have a dependence that\n"
     "                   tells so; inline assembly ends the run\n"
+    "  --innermost      with --check: dependences are those of innermost loops alone, as under --use_g2\n"
     "  --globals        a digest of each object's contents at the end\n"
     "  --help           this text\n"
     "The status is main's value modulo 256, or:\n"
@@ -53,6 +54,8 @@ int main(int argc, char** argv) {
             options.profile = true;
         else if (word == "--check")
             options.check = true;
+        else if (word == "--innermost")
+            options.innermost = true;
         else if (word == "--globals")
             options.globals = true;
         else if (word == "--max-steps" || word == "--max-memory") {

@@ -86,8 +86,8 @@ class Tools:
     def execute(self, unit, words=()):
         return run([self.icrun, "--max-steps", MAX_STEPS, *words, unit])
 
-    def dump(self, unit):
-        done = run([self.icdump, unit])
+    def dump(self, unit, words=()):
+        done = run([self.icdump, *words, unit])
         if done.status != 0:
             raise Trouble(f"{unit}: dump status {done.status}: {last_line(done)}")
         return done.output

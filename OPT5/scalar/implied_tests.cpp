@@ -353,10 +353,14 @@ void lead_around(BBLK* pred, BBLK* bb, LIST* control, BBLK* target) {
 // Conditions are compared first, since few agree; the statements between two that do are looked at then.
 class TEST_REMOVER {
 public:
+    // The last test first: an edge that is led around one test arrives where those behind it have been left already, so
+    // that a row of equal tests is passed in one step.
     bool run() {
+        std::vector<BBLK*> blocks;
+        for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink) blocks.push_back(bb);
         bool changed = false;
-        for (BBLK* bb = currfuninfo->bb_list->dflink; bb; bb = bb->dflink)
-            if (outcomes.control_of(bb)) changed |= remove_test(bb);
+        for (auto bb = blocks.rbegin(); bb != blocks.rend(); ++bb)
+            if (outcomes.control_of(*bb)) changed |= remove_test(*bb);
         return changed;
     }
 

@@ -4,6 +4,7 @@
 static int a[128], b[128], grid[12][12];
 static short s[64];
 static long sums[16];
+static volatile int port, ports[8];
 
 static void fill(void) {
     for (int i = 0; i < 128; i++) a[i] = 3 * i, b[i] = i * i % 31;
@@ -51,6 +52,14 @@ static void nested(int n, int c, int m) {
     if (c) k = m;
     for (int i = 0; i < 40; i++) a[i + k] = a[i + n] + 1;
 }
+// What loads and stores meets itself in every iteration but its own; what is volatile in each.
+static void repeated(int* p, int n, int c) {
+    for (int i = 0; i < n; i++) *p += b[i], p[1] += a[i];
+    for (int i = 0; i < n; i++) a[i] += 1, a[i + c] ^= 2;
+    for (int i = 0; i < n; i++)
+        for (int j = 0; j < n; j++) grid[j][c] += b[i], grid[i][j] += 1;
+    for (int i = 0; i < n; i++) port += a[i], ports[i & 3] += port, a[i] = ports[1];
+}
 static void searched(void) { // tested on top, and left in the middle
     int i = 0, j = 20;
     while (i < j) {
@@ -74,7 +83,9 @@ int main(void) {
     for (int i = 0; i < 64; i++) s[i] = (short)b[i];
     nested(12, 1, 9);
     nested(10, 0, 9);
+    repeated(a + 40, 9, 3);
     searched();
+    put_i16(port + ports[2]);
     put_i32(sum_of(a, 128));
     put_i32(sum_of(b, 128));
     put_i32(sum_of(&grid[0][0], 144));

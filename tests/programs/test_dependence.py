@@ -1,4 +1,5 @@
 """Edges between the two accesses of a loop, as the whole optimizer tells them to the code generator."""
+import os
 import re
 import sys
 import tempfile
@@ -7,8 +8,9 @@ from pathlib import Path
 
 HERE = Path(__file__).resolve().parent
 sys.path.insert(0, str(HERE.parent.parent / "tools"))
+import affine_nests  # noqa: E402
 from icparse_lib import cli  # noqa: E402
-from zbench import INCLUDE, Tools  # noqa: E402
+from zbench import INCLUDE, Tools, difference  # noqa: E402
 
 DECLARATIONS = """
 int a[1000], d[1000]; long b[1000]; long long e[500]; int c[100][20]; long m[40][30];
@@ -105,6 +107,67 @@ class Dependence(unittest.TestCase):
             told = " ".join(f"{x}-{y} {' '.join(v)}" for (x, y), v in sorted(edges(part).items()))
             with self.subTest(loop=loop, statement=s):
                 self.assertEqual(told, want)
+
+
+TOLD = ["--float_support=fpu32", "--disable_inlining"]
+# Loops whose vectors are exact, for what becomes of a file in which one distance is forgotten.
+TELLING = """#include <zrun.h>
+int a[200]; long b[200]; int m[20][20];
+void f(int n, int *p) {
+    for (int i = 0; i < 60; i++) a[i + 2] = a[i] + 1;
+    for (int i = 59; i >= 0; i--) b[2 * i] = b[2 * i + 6] + 1;
+    for (int i = 0; i < 9; i++) for (int j = 0; j < 9; j++) m[i + 1][j] = m[i][j + 1] + 1;
+    for (int i = 0; i < n; i++, p += 2) p[6] = p[0];
+}
+int main(void) { f(9, a); put_i16(a[61]); put_i32(b[4]); put_i16(m[4][4]); return 0; }
+"""
+
+
+class TraceCheck(unittest.TestCase):
+    """A run is held against the edges: whatever two accesses meet, an edge must tell so (icrun --check)."""
+
+    def run_in_folder(self, source, work):
+        with tempfile.TemporaryDirectory() as folder:
+            path, unit, out = (Path(folder) / name for name in ("p.c", "p.if", "p.opt"))
+            path.write_text(source)
+            self.assertEqual(cli.main(["-w", "-I", str(INCLUDE), str(path), "-o", str(unit)]), 0)
+            return work(Tools(), unit, out)
+
+    def test_no_meeting_is_missing(self):
+        def work(tools, unit, out):
+            want = tools.execute(unit)
+            self.assertEqual(want.status, 0, want.errors)
+            for words, check in ((["--opt_level=2", *TOLD], []), (["--opt_level=3", *TOLD], []),
+                                 (["--opt_level=2", *TOLD, "--use_g2"], ["--innermost"])):
+                tools.optimize(unit, out, words)
+                wrong = difference(want, tools.execute(out, ["--check", *check]))
+                self.assertIsNone(wrong, f"{words}: {wrong}")
+
+        first, count = int(os.environ.get("NESTS_FROM", "0")), int(os.environ.get("NESTS_COUNT", "10"))
+        for seed in range(first, first + count): # of 30 nests each
+            with self.subTest(seed=seed):
+                self.run_in_folder(affine_nests.program(seed, 30), work)
+
+    def test_a_forgotten_distance_is_caught(self):
+        def work(tools, unit, out):
+            tools.optimize(unit, out, ["--opt_level=2", *TOLD])
+            self.assertEqual(tools.execute(out, ["--check"]).status, 0)
+            whole = out.read_bytes()
+            records = re.findall(r"0x(\w+) +59 +(\d+) ", tools.dump(out, ["--raw"]))
+            forgotten = 0
+            for at, size in records:
+                start = int(at, 16) + 2
+                last = start + int(size) - 2 # the direction of the innermost loop, behind it the distance
+                changed = bytearray(whole)
+                if changed[start + 1] & 7 or changed[start + 2] < 2: # of speculation; of accesses in different loops
+                    continue
+                changed[last + 1] = (changed[last + 1] + 1) % 256
+                forgotten += 1
+                out.write_bytes(changed)
+                self.assertEqual(tools.execute(out, ["--check"]).status, 75, f"vector at {at}")
+            self.assertEqual(forgotten, 3)
+
+        self.run_in_folder(TELLING, work)
 
 
 if __name__ == "__main__":

@@ -295,7 +295,7 @@ void COMPILER::function() {
     if (!fault.empty()) throw EXEC_ERROR{EXEC_TRIPS, fault + " (in " + f->name + ", line " + std::to_string(f->code.front().line) + ")"};
     find_promised_loops(*f);
     if (numbered.empty()) f->dependences = nullptr;
-    if (f->dependences) f->dependences->find_nests(f->code);
+    if (f->dependences) f->dependences->find_nests(f->code, p.options.innermost);
     f->frame = (f->frame + 3) & ~uint64_t{3};
     f->depth = deepest;
 }

@@ -25,7 +25,8 @@ bool covers(const IC_FACTS& v, const std::vector<int64_t>& distances) {
 }
 } // namespace
 
-void DEPENDENCES::find_nests(const std::vector<STMT>& code) {
+void DEPENDENCES::find_nests(const std::vector<STMT>& code, bool innermost) {
+    is_of_innermost = innermost;
     bool is_reducible;
     loops_m = natural_loops(code, &is_reducible);
     if (!is_reducible) loops_m.clear(); // there is no loop but the function
@@ -88,6 +89,9 @@ void ACCESS_WATCH::check(const SEEN& first, const SEEN& second, MACHINE& m) cons
     std::vector<int64_t> distances;
     for (size_t k = 0; k < a.size() && k < b.size() && a[k] == b[k]; k++)
         distances.push_back(static_cast<int64_t>(second.iterations[k] - first.iterations[k]));
+    if (told.tells_of_innermost_alone() && a == b && !distances.empty() &&
+        std::any_of(distances.begin(), distances.end() - 1, [](int64_t d) { return d != 0; }))
+        return;
     if (told.has_edge(first.access->id, second.access->id, distances)) return;
     std::string text = "access " + std::to_string(second.access->id) + " follows access " +
                        std::to_string(first.access->id) + " of line " +

@@ -24,11 +24,14 @@ class DEPENDENCES {
 public:
     void add_vector(const IC_FACTS* v) { vectors[v->word[0]] = v; }
     void add_edge(uint32_t from, uint32_t to, uint32_t vector) { edges[key(from, to)].push_back(vector); }
-    void find_nests(const std::vector<STMT>& code); // when it is complete
+    // When the code is complete. `innermost`: of two accesses in one loop a dependence need not tell what loops around it
+    // carry.
+    void find_nests(const std::vector<STMT>& code, bool innermost);
 
     // By statement: the loops around it, the outermost first.
     const TARGETS& nest(uint32_t statement) const { return nests[statement]; }
     const std::vector<LOOP_BODY>& loops() const { return loops_m; }
+    bool tells_of_innermost_alone() const { return is_of_innermost; }
     bool has_edge(uint32_t from, uint32_t to, const std::vector<int64_t>& distances) const; // by level, from 1
 
 private:
@@ -38,6 +41,7 @@ private:
     std::unordered_map<uint64_t, std::vector<uint32_t>> edges;
     std::vector<LOOP_BODY> loops_m;
     std::vector<TARGETS> nests;
+    bool is_of_innermost = false;
 };
 
 // The accesses of one activation.

@@ -33,6 +33,7 @@ struct EXEC_OPTIONS {
     bool stats = false;
     bool profile = false;
     bool check = false;
+    bool innermost = false; // of a checked run: dependences that a loop around the innermost one carries are not told
     bool globals = false;
 };
 

@@ -349,6 +349,27 @@ private:
         return may_be_sum(terms->data(), terms->data() + terms->size(), v);
     }
 
+    // There are terms that make up for whatever the others are, up to `e`, while the iterations are the same at `in_step`.
+    bool has_free_terms(WIDE e, uint64_t in_step) const {
+        SPAN free, others;
+        others.add_constant(constant - e);
+        const auto add = [&](const UNKNOWN& u) {
+            (u.by == 1 || u.by == -1 ? free : others).add_multiple(u.by, u.low, u.high);
+        };
+        for (const UNKNOWN& u : unknowns) add(u);
+        for (const PAIR& p : pairs) {
+            if (p.levels & ~in_step)
+                add(p.a), add(p.b);
+            else
+                add(joined(p.a, p.b));
+        }
+        for (const LEVEL_TERM& l : levels) {
+            others.add_multiple(l.a, 0, l.last);
+            others.add_multiple(-l.b, 0, l.last);
+        }
+        return (!free.has_min || (others.has_max && free.min <= -others.max)) &&
+               (!free.has_max || (others.has_min && free.max >= -others.min)) && (free.min < free.max || !free.has_max);
+    }
     bool is_concerned(int level) const {
         return levels[static_cast<size_t>(level)].is_there() ||
                std::any_of(pairs.begin(), pairs.end(), [level](const PAIR& p) { return p.levels >> level & 1; });
@@ -380,8 +401,15 @@ private:
         DVE& at = v->dve[static_cast<size_t>(k)];
         const DVE before = at;
         auto goes = [&](WIDE low, WIDE high) { return !may_be(e, *v, k, {low, high}); };
+        uint64_t in_step = uint64_t(1) << k;
+        for (int l = 1; l < v->count(); ++l)
+            if (v->dve[static_cast<size_t>(l)].has_only_SAME_dir()) in_step |= uint64_t(1) << l;
+        if (has_free_terms(e, in_step)) return true;
+        if (at.same && goes(0, 0)) at.same = false;
+        *any |= at != before;
+        if (has_free_terms(e, in_step & ~(uint64_t(1) << k))) return at.is_dependent();
         for (int d = -DVE::LIMIT; d <= DVE::LIMIT; ++d)
-            if (at.has_distance(INT65(d)) && goes(d, d)) at.clr_distance(INT65(d));
+            if (d && at.has_distance(INT65(d)) && goes(d, d)) at.clr_distance(INT65(d));
         if (at.overflow_high && goes(DVE::LIMIT + 1, FAR)) at.overflow_high = false;
         if (at.overflow_low && goes(-FAR, -DVE::LIMIT - 1)) at.overflow_low = false;
         *any |= at != before;

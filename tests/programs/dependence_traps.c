@@ -10,8 +10,8 @@ static void fill(void) {
     for (int i = 0; i < 128; i++) a[i] = 3 * i, b[i] = i * i % 31;
 }
 static long sum_of(const int* p, int n) {
-    long sum = 0;
-    while (n--) sum = sum * 3 + *p++;
+    unsigned long sum = 0;
+    while (n--) sum = sum * 3 + (unsigned)*p++;
     return sum;
 }
 // The last iteration alone meets the fixed element; so does the middle of two that cross.
@@ -54,11 +54,11 @@ static void nested(int n, int c, int m) {
 }
 // What loads and stores meets itself in every iteration but its own; what is volatile in each.
 static void repeated(int* p, int n, int c) {
-    for (int i = 0; i < n; i++) *p += b[i], p[1] += a[i];
-    for (int i = 0; i < n; i++) a[i] += 1, a[i + c] ^= 2;
+    for (int i = 0; i < n; i++) *p += b[i] & 7, p[1] ^= a[i];
+    for (int i = 0; i < n; i++) a[i] ^= 1, a[i + c] ^= 2;
     for (int i = 0; i < n; i++)
-        for (int j = 0; j < n; j++) grid[j][c] += b[i], grid[i][j] += 1;
-    for (int i = 0; i < n; i++) port += a[i], ports[i & 3] += port, a[i] = ports[1];
+        for (int j = 0; j < n; j++) grid[j][c] += b[i] & 3, grid[i][j] ^= 1;
+    for (int i = 0; i < n; i++) port ^= a[i], ports[i & 3] ^= port, a[i] = ports[1];
 }
 static void searched(void) { // tested on top, and left in the middle
     int i = 0, j = 20;
@@ -85,7 +85,7 @@ int main(void) {
     nested(10, 0, 9);
     repeated(a + 40, 9, 3);
     searched();
-    put_i16(port + ports[2]);
+    put_i16(port ^ ports[2]);
     put_i32(sum_of(a, 128));
     put_i32(sum_of(b, 128));
     put_i32(sum_of(&grid[0][0], 144));

@@ -44,7 +44,7 @@ public:
         for (auto& [sym, value] : values) erase_tree(value);
     }
     bool empty() const { return values.empty(); }
-    // Replaces what `t`, or the operands of an assignment, read at the place. True if anything.
+    // Replaces what the statement reads. True if anything; the cell is left empty where nothing of it remains.
     bool statement(LIST* s, const BBLK* bb, int position);
 
 private:
@@ -164,7 +164,7 @@ bool GLOBAL_ASGS::statement(LIST* s, const BBLK* bb, int position) {
         t->left = read(t->left);
     else
         s->first = t = read(t);
-    if (any) s->first = simp_tree(t, nullptr);
+    if (any) s->first = peel_for_effect(simp_tree(t, nullptr));
     return any;
 }
 
@@ -177,6 +177,7 @@ bool walk_global_asgs() {
         if (bb->is_in_LIR_form()) continue;
         int position = 0;
         for (LIST* s = bb->statements; s; s = s->rest) any |= known.statement(s, bb, ++position);
+        if (any) drop_empty_cells(&bb->statements);
     }
     return any;
 }
@@ -190,7 +191,7 @@ bool walk_local_asgs(unsigned kinds) {
         if (!last || !before || before->rest || before->first != last) known.restart();
         last = bb->is_in_LIR_form() ? nullptr : bb;
         if (!last) continue;
-        for (LIST* s = bb->statements; s; s = s->rest) any |= known.statement(s);
+        walk_block(known, bb, &any);
     }
     return any;
 }

@@ -16,6 +16,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/scope.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/subrange.h"
@@ -242,6 +243,17 @@ void LOCAL_ASGS::read_parts(NODE* t) {
 
 // ---- Statements
 
+// Of a statement that became several.
+bool LOCAL_ASGS::split(LIST* s) {
+    const LIST* const end = s->rest;
+    promote_toplevel_COMMAOPs_in_list(s, end);
+    for (; s != end; s = s->rest) {
+        forget_names(s->first);
+        forget_parts(s->first);
+    }
+    return true;
+}
+
 bool LOCAL_ASGS::statement(LIST* s) {
     NODE* t = s->first;
     any = false;
@@ -252,10 +264,22 @@ bool LOCAL_ASGS::statement(LIST* s) {
         forget_names(t->right);
         if (!names.empty()) s->first = t = cp_opASG_RL(read_names(t));
         if (!parts.empty() && !tree_contains_op(t, ASM)) read_parts(t);
-        if (any) s->first = t = simp_tree(t, nullptr);
+        if (any) {
+            s->first = t = peel_for_effect(simp_tree(t, nullptr));
+            if (!t) return true;
+            if (t->op == COMMAOP) return split(s);
+        }
     }
     forget_names(t);
     forget_parts(t);
     if (is_plain && t->op == ASG) learn(t);
     return any;
+}
+
+void walk_block(LOCAL_ASGS& known, BBLK* bb, bool* any) {
+    for (LIST *s = bb->statements, *next; s; s = next) {
+        next = s->rest;
+        *any |= known.statement(s);
+    }
+    if (*any) drop_empty_cells(&bb->statements);
 }

@@ -7,6 +7,7 @@
 #include <utility>
 #include <vector>
 
+class BBLK;
 class NODE;
 class SYMTAB;
 struct LIST;
@@ -31,7 +32,8 @@ public:
     ~LOCAL_ASGS() { restart(); }
 
     void restart(); // nothing is known
-    // The next statement of the chain: its reads, then what it makes known. True if it was changed.
+    // The next statement of the chain: its reads, then what it makes known. True if it was changed; the cell is left empty
+    // where nothing of it remains.
     bool statement(LIST* s);
 
 private:
@@ -47,6 +49,7 @@ private:
         NODE* value;
     };
 
+    bool split(LIST* s);
     void inc_depnum(const SYMTAB* sym) { ++depnums[sym]; }
     void forget_names(const NODE* t);
     void learn(const NODE* t);
@@ -70,3 +73,6 @@ private:
     bool any = false;     // replaced in the statement in work
     bool in_test = false; // of a branch, which only constants change
 };
+
+// The statements of the next block of the chain. `*any` is set if one was changed.
+void walk_block(LOCAL_ASGS& known, BBLK* bb, bool* any);

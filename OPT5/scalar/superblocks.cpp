@@ -59,8 +59,7 @@ void optimize_superblocks_in_cfg() {
         if (print_debug && fdebug && superblock->contents.size() > 1) superblock->print(false, fdebug);
         LOCAL_ASGS known(ASGS_TO_NAMES);
         for (BBLK* bb : superblock->contents)
-            if (!bb->is_in_LIR_form())
-                for (LIST* s = bb->statements; s; s = s->rest) changed |= known.statement(s);
+            if (!bb->is_in_LIR_form()) walk_block(known, bb, &changed);
     }
     if (changed) simpcfg(false, false);
 }

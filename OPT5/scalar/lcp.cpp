@@ -128,7 +128,9 @@ NODE* GLOBAL_ASGS::lookup_global_ASG(NODE* name) {
         sym = value->u.sym;
     }
     if (!value) return name;
-    report_replacement("lookup_global_ASG", name, value);
+    report_replacement("\n\t============== (%ld) 'lookup_global_ASG' is replacing this:\n",
+                       "\n\t============== with the following substitute:\n",
+                       "\n\t=============================================\n", name, value);
     NODE* substitute = copy_tree(value);
     substitute->ls = name->ls;
     substitute = coerce_to_type(name->type->stqs(), substitute);

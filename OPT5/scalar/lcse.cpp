@@ -35,27 +35,6 @@
 #include <unordered_map>
 #include <vector>
 
-bool good_CSE_tree(const NODE* t, bool) {
-    if (!t->type->is_scalar() || t->type->is_complex()) return false;
-    switch (t->op) {
-    case OUIALIGN:
-    case NONALIGN:
-    case SCON:
-    case ICON:
-    case FCON:
-    case NAME: return false;
-    case PLUS:
-    case MINUS: // a constant displacement belongs to the access
-        return !(t->type->is_pointer() && t->right->op == ICON);
-    case UAND:
-    case ARGREF: return false; // a constant, or the sum below it
-    case SCONV:                // a product of two of them is the short one, which one of variables would not be
-    case PCONV:
-    case ISP2CHAR: return false;
-    default: return true;
-    }
-}
-
 namespace {
 
 using VALUE = int; // a value's number; 0: none
@@ -183,7 +162,7 @@ VALUE NUMBERS::of(const NODE* t) {
 int NUMBERS::cost_of(const NODE* t) {
     int& cost = known[t].cost;
     if (cost < 0) {
-        int sum = weight_of_operator(t);
+        int sum = t->op == NAME && good_CSE_tree(t, false) ? 1 : weight_of_operator(t);
         if (t->left) sum += cost_of(t->left);
         if (t->right) sum += cost_of(t->right);
         cost = std::min(sum, 1 << 20);
@@ -344,6 +323,9 @@ void COMMON_SUBEXPRESSIONS::end_chain() {
 void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
     NODE* t = s->first;
     current = s;
+    for_each_subtree(t, [](NODE* n) {
+        if ((n->op == UMULT && !n->right) || n->op == STREF) n->left = normalize_ptr_for_indexing(n->left);
+    });
     numbers.begin_statement();
     if (!reads_come_first(t)) {
         numbers.forget_changed(t);
@@ -390,9 +372,16 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
         if (!is_plain) v = numbers.of_step(t, numbers.of(t->left), v);
         read(t->right, true);
     }
+    // The alias rules are asked about the address as it was, not about a temporary.
+    NODE* place = t->left->op == NAME ? nullptr : copy_tree(t->left);
     read_place(t->left, true);
+    if (place) std::swap(t->left, place);
     numbers.forget_changed(t);
     if (v && type_code(t->left->type) == type_code(is_plain ? t->right->type : t->left->type)) learn_store(t, v);
+    if (!place) return;
+    std::swap(t->left, place);
+    erase_tree(place);
+    numbers.begin_statement();
 }
 
 // Whether `x op= e` is `x = x op e` in the type of x.
@@ -438,7 +427,7 @@ void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
 // ---- Reads
 
 void COMMON_SUBEXPRESSIONS::read(NODE*& slot, bool is_certain) {
-    if (!slot || number_of_operands[slot->op] == 0) return;
+    if (!slot || (number_of_operands[slot->op] == 0 && !good_CSE_tree(slot, false))) return;
     if (!reuse(slot, is_certain)) read_operands(slot, is_certain);
 }
 
@@ -496,7 +485,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
     }
     NODE* t = slot;
     if (!good_CSE_tree(t, false) || !type_code(t->type)) return false;
-    if (!op_is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF) return false;
+    if (!op_is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF && t->op != NAME) return false;
     const VALUE v = numbers.of(t);
     OCCURRENCES& known = values[v];
     if (SYMTAB* holder = holder_of(known, v, t->type)) {

@@ -54,13 +54,21 @@ bool ok_to_propagate_for_pointer(const NODE* value, const NODE* target) {
     return of_value && of_target && (of_value->encloses(of_target) || of_target->encloses(of_value));
 }
 
-void report_replacement(const char* by, const NODE* old, const NODE* value) {
+void report_replacement(const char* head, const char* middle, const char* end, const NODE* old, const NODE* value) {
     static long count = 0;
     if (!print_debug) return;
-    debug_printf("\n\t========== (%ld) '%s' is replacing this:\n%s\n", ++count, by, tree_to_infix(old).c_str());
-    debug_printf("\n\t========== with the following substitute:\n%s\n", tree_to_infix(value).c_str());
-    debug_printf("\n\t=========================================\n");
+    debug_printf(head, ++count); // NOLINT: one of the texts of the callers
+    debug_printf("%s\n%s%s\n%s", tree_to_infix(old).c_str(), middle, tree_to_infix(value).c_str(), end);
 }
+
+namespace {
+
+void report_local_replacement(const char* head, const NODE* old, const NODE* value) {
+    report_replacement(head, "\n\t========== with the following substitute:\n",
+                       "\n\t=========================================\n", old, value);
+}
+
+} // namespace
 
 void LOCAL_ASGS::restart() {
     for (auto& [sym, known] : names) erase_tree(known.value);
@@ -142,7 +150,7 @@ NODE* LOCAL_ASGS::lookup_ASG(NODE* name) {
     if (known.depnum != depnums[name->u.sym]) return name;
     if (known.value->op == NAME && known.source_depnum != depnums[known.value->u.sym]) return name;
     if (in_test && known.value->op == NAME) return name;
-    report_replacement("lookup_ASG", name, known.value);
+    report_local_replacement("\n\t========== (%ld) 'lookup_ASG' is replacing this:\n", name, known.value);
     NODE* value = copy_tree(known.value);
     value->ls = name->ls;
     value = coerce_to_type(name->type->stqs(), value);
@@ -180,7 +188,10 @@ NODE* LOCAL_ASGS::cp_opASG_RL(NODE* t) {
     if (at == names.end() || at->second.depnum != depnums[t->left->u.sym]) return t;
     if (!is_manifest_constant(at->second.value)) return t;
     t = opASG_to_ASG(t);
-    if (t->op != ASG) return t;
+    if (t->op != ASG) {
+        debug_printf("\n\n!!! COMPILER (OPTIMIZER) ERROR IN 'cp_opASG_RL' !!!\n\n");
+        return t;
+    }
     t->right = read_names(t->right);
     return simp_tree(t, nullptr);
 }
@@ -191,7 +202,7 @@ NODE* LOCAL_ASGS::cp_indirect_RL(NODE* t) {
     if (!is_whole_scalar(t) || lvalue_is_volatile(t)) return nullptr;
     for (const PART& p : parts) {
         if (!equiv_mtypes(p.lvalue->type, t->type) || !trees_are_congruent(p.lvalue, t, false)) continue;
-        report_replacement("cp_indirect_RL", t, p.value);
+        report_local_replacement("\n\t========== (%ld) 'cp_indirect_RL' is replacing this:\n", t, p.value);
         erase_tree(t);
         any = true;
         return copy_tree(p.value);

@@ -21,8 +21,8 @@ enum LOCAL_ASG_KINDS : unsigned {
 // Whether reads of `target` may become `value`: a pointer that `restrict` speaks of is not mixed with others.
 bool ok_to_propagate_for_pointer(const NODE* value, const NODE* target);
 
-// What `copyprop` reports of each replacement in its dump. The next number of the function is taken.
-void report_replacement(const char* by, const NODE* old, const NODE* value);
+// What propagation reports of each replacement in its dump: `head` takes the number of the replacement.
+void report_replacement(const char* head, const char* middle, const char* end, const NODE* old, const NODE* value);
 
 class LOCAL_ASGS {
 public:

@@ -55,6 +55,16 @@ int operands_change(int a, int b) {
     return x - y + a++ + (a + b);
 }
 
+// Accesses a constant apart share the sum of base and index.
+struct T { int a; long b; } tab[6];
+// FUNCTION: neighbours
+// COUNT 1: + i
+// COUNT 1: PMCONV(
+long neighbours(const int *x, int i) {
+    return x[i + 1] * x[i + 2] + x[i] - x[i - 1] + tab[i + 2].b * tab[i].a - tab[i + 1].b;
+}
+unsigned wraps(const int *x, unsigned i) { return x[(unsigned)(i + 1)] + x[(unsigned)(i + 2)] + x[(unsigned)(i + 3)]; }
+
 // Dropped: the variable has the value already.
 // FUNCTION: redundant
 // COUNT 1: x = 
@@ -77,6 +87,8 @@ int old_and_new(int n, int a) {
     return s + last;
 }
 
+int row[10] = {5, 9, 2, 8, 11, 1, 7, 3, 4, 6};
+
 int main(void) {
     struct S s;
     float f;
@@ -90,6 +102,8 @@ int main(void) {
         g = c; put_i16(around_calls(&g, c)); put_i16(around_writer(&g, c));
         put_i16(operands_change(c, 7)); put_i16(redundant(c, 5)); put_i16(arms(c, 9)); put_i16(kept(c));
         put_i16(only_on_one_path(c, 6)); put_i16(through_restrict(&g, &h)); put_i16(old_and_new(c, 5));
+        tab[c < 0 ? 0 : c].b = c * 70000L; tab[c & 3].a = c; put_i32(neighbours(row + 3, c < 0 ? 1 : c - (c == 4)));
+        put_u32(wraps(row, c < 0 ? 65535u : c));
         here = &g - 2; put_i16(self(&pp, &pp));
     }
     return 0;

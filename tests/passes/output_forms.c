@@ -6,7 +6,7 @@ long row[4][7];
 struct triple { int a, b, c; } list[5];
 
 // FUNCTION: element
-// HAS: /_row \+ PMCONV\(\(long\)i, 224\)\)? \+ PMCONV\(j, 32\)\)?.*PMCONV\(\(long\)\(i - 1\), 48\).*PMCONV\(k, 48\) - 3/
+// HAS: /_row \+ PMCONV\(\(long\)i, 224\)\)? \+ PMCONV\(j, 32\)\)?.*PMCONV\(\(long\)i, 48\) - 3.*PMCONV\(k, 48\) - 3/
 long element(int i, long j, long k, const struct triple* p) { return row[i][j] + p[i - 1].c + p[k - 1].c; }
 
 // An unsigned step of a pointer is widened with zeros, so it stays; a product that is no offset stays one.

@@ -16,6 +16,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 
+#include <algorithm>
 #include <atomic>
 
 namespace {
@@ -185,9 +186,30 @@ void find_points_to(FACTS) {
     if (print_debug >= 3) dump_PT_info(*store);
 }
 
+// What an access is said to reach is no less than what is found anew. SSA form, of which less would be found, is passed
+// over.
+bool bindings_still_hold() {
+    std::vector<std::pair<const NODE*, PTENV>> before;
+    bool is_SSA_form = false;
+    for_each_tree(currfuninfo, [&](const NODE* tree) {
+        for_each_subtree(tree, [&](const NODE* t) {
+            is_SSA_form |= op_is_SSA(t->op);
+            if (t->op != UMULT && t->op != STREF) return;
+            if (const PTENV* e = PT_info_of(t)) before.emplace_back(t, *e);
+        });
+    });
+    if (is_SSA_form) return true;
+    find_points_to(fact::points_to);
+    BINDINGS& bindings = PT_store()->bindings;
+    return std::all_of(before.begin(), before.end(), [&bindings](std::pair<const NODE*, PTENV>& b) {
+        const PTENV* old = bindings.intern(std::move(b.second));
+        return bindings.meet(old, PT_info_of(b.first)) == old;
+    });
+}
+
 const FACT_FINDER finder("what pointers may refer to", fact::points_to,
                          fact::alias_marks | fact::pointees | fact::block_numbers, find_points_to,
-                         [] { currfuninfo->points_to.reset(); });
+                         [] { currfuninfo->points_to.reset(); }, bindings_still_hold);
 
 } // namespace
 

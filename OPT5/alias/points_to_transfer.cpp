@@ -71,7 +71,7 @@ PTENV of_object(SYMTAB* object, int64_t offset, int64_t stride) {
 } // namespace
 
 unsigned simple_pointer(const PT_STORE& store, const NODE* t) {
-    const NODE* name = name_accessed(t);
+    const NODE* name = name_accessed(below_SSA(t));
     return name && name->u.sym && compatible_types(name->u.sym->type, t->type, true) ? store.number_of(name->u.sym)
                                                                                     : PT_STORE::NONE;
 }
@@ -92,7 +92,7 @@ const PTENV* PT_TRANSFER::of_base(const NODE* base, const PT_STATE& s) {
 }
 
 const PTENV* PT_TRANSFER::evaluate(const NODE* t, const PT_STATE& s) {
-    while (t->op == ASG || t->op == COMMAOP) t = t->right;
+    for (t = below_SSA(t); t->op == ASG || t->op == COMMAOP;) t = below_SSA(t->right);
     if (!t->type->is_pointer()) return nullptr;
     const ADDRESS_FORM form = pointer_form(t);
     const LINEAR_FORM::TERM* base = nullptr;
@@ -224,6 +224,7 @@ void PT_TRANSFER::refine(const NODE* c, PT_STATE& s) {
 }
 
 void PT_TRANSFER::statement(const NODE* t, PT_STATE& s, bool at_accesses) {
+    t = below_SSA(t);
     for_each_write(t, [&](const WRITE& w) {
         if (w.by != t) drop_written(w, s);
     });

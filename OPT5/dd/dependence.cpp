@@ -48,7 +48,7 @@ void init_dependence_analysis() {
     struct LOOP* root = loop_root();
     if (!root || dependence_analysis_enabled) optassert("root && !dependence_analysis_enabled", __FILE__, __LINE__);
     dependence_analysis_enabled = true;
-    need(fact::alias);
+    need(fact::alias | fact::points_to);
     redo_dependence_analysis(root);
 }
 

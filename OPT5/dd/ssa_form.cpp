@@ -417,7 +417,7 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo) {
     if (!currfuninfo->no_calls && currfuninfo->saves_environment) return;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         promote_toplevel_COMMAOPs_in_list(bb->statements, bb->last_statement());
-    need(fact::dominators | fact::alias);
+    need(fact::dominators | fact::alias | fact::points_to);
     SSA_BUILD build;
     build.onlySSV = onlySSV;
     build.onlyIV = onlyIV;

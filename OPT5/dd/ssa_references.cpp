@@ -235,7 +235,7 @@ bool SSA_CHANGES::may_meet(const NODE* write, const NODE* place, const SSAVAR* w
     if (written) {
         if (written->sym == v->sym && written->pointer == v->pointer) return written->overlaps(v);
         if (written->sym && v->sym) return object_symbols_may_alias(written->sym, v->sym);
-        place = written->tree;
+        if (!place) place = written->tree;
     }
     if (--questions_left < 0) return true;
     if (place) return lvalues_may_be_aliased(access_of_place(place), v->tree);
@@ -257,7 +257,8 @@ void SSA_CHANGES::find(const SSA_SITE& site, const std::vector<SSAVAR*>& live_me
         stamp[v->uid] = now;
         add_what_overlaps(v);
         if (v->sym) add_what_is_behind(v->sym);
-        if (v->is_memory()) add_aliases(site.node, nullptr, v, live_memory);
+        const NODE* assignment = ssa_assignment(site.node);
+        if (v->is_memory()) add_aliases(site.node, assignment ? below_SSA(assignment->left) : nullptr, v, live_memory);
         return;
     }
     for_each_write_of_node(site.node, [&](const WRITE& w) {

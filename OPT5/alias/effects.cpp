@@ -205,6 +205,12 @@ bool tree_changes_nothing(const NODE* tree) {
     });
 }
 
+bool call_is_pure(const NODE* call) {
+    if (call->op != CALL || !call->type->is_scalar()) return false;
+    FUNINFO* f = find_FUNINFO_for_call(call);
+    return f && TEST_FLAG(f, FUN_is_pure_fun) && !TEST_FLAG(f, FUN_never_returns);
+}
+
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
     const bool is_volatile = lvalue_is_volatile(lvalue);
     return any_subtree(a, [=](const NODE* t) { return node_may_modify(t, lvalue, is_volatile); });

@@ -5,6 +5,8 @@
 // not change in a loop is thereby computed ahead of it, if the loop computes it in any case.
 //
 // Needs: `annotate_cfg`, no loop hierarchy. Leaves: nothing where edges were split, what rests on the graph otherwise.
+// A call of a function that only computes is an expression as any other; as a division, it is not made earlier than what may
+// not return.
 // Sound because a computation is placed only where every path from there computes the expression before its operands
 // change (so that nothing is computed that was not, and nothing traps that did not; a statement that may not pass
 // control on counts as a change for what may trap), and is taken away only where all paths have it in the temporary.
@@ -70,6 +72,9 @@ public:
     ~EXPRESSION() { forget(); }
     // Whether it pays; fills what is to be done.
     bool decide();
+    // Whether all paths to what is taken away compute it, before anything is done; reports where not.
+    bool is_given_where_deleted(int number);
+    void dump_annotations(int number);
 
     struct EDGE_PLACE {
         BBLK *from, *to;
@@ -110,12 +115,12 @@ private:
     static bool end_takes_computation(const BBLK* b);
 
     void find_local_facts();
-    void find_partial_availability();
+    void compute_PAVIN();
     bool may_be_redundant();
-    void find_availability();
-    void find_placement();
+    void compute_AVOUT();
+    void compute_PPIN();
     bool may_be_placed(const BBLK* b);
-    void find_insertions();
+    void compute_INSERT();
     void find_saves();
     bool pays() const;
 
@@ -211,7 +216,7 @@ void EXPRESSION::find_local_facts() {
     }
 }
 
-void EXPRESSION::find_partial_availability() {
+void EXPRESSION::compute_PAVIN() {
     std::vector<const BBLK*> waiting;
     auto enter_successors = [&](const BBLK* b) {
         for (const EDGE* s = b->successors; s; s = s->rest) {
@@ -231,7 +236,7 @@ void EXPRESSION::find_partial_availability() {
     }
 }
 
-void EXPRESSION::find_availability() {
+void EXPRESSION::compute_AVOUT() {
     std::vector<int> waiting = region;
     while (!waiting.empty()) {
         const int b = waiting.back();
@@ -275,7 +280,7 @@ bool EXPRESSION::may_be_placed(const BBLK* b) {
     return true;
 }
 
-void EXPRESSION::find_placement() {
+void EXPRESSION::compute_PPIN() {
     for (int b : region)
         if ((at(b) & ANTLOC) || !(at(b) & (ALTERED | STAYS))) at(b) |= PPIN;
     std::vector<int> waiting = region;
@@ -292,7 +297,7 @@ void EXPRESSION::find_placement() {
     }
 }
 
-void EXPRESSION::find_insertions() {
+void EXPRESSION::compute_INSERT() {
     std::vector<int> ends;
     for (int b : region) {
         if (!(at(b) & PPIN)) continue;
@@ -365,7 +370,7 @@ bool EXPRESSION::pays() const {
 
 bool EXPRESSION::may_be_redundant() {
     find_local_facts();
-    find_partial_availability();
+    compute_PAVIN();
     return function.blocks_left >= 0 && std::any_of(t.sites.begin(), t.sites.end(), [this](const TRIPLE_SITE& site) {
         return (at(site.block) & (EXPOSED | PAVIN)) == (EXPOSED | PAVIN);
     });
@@ -377,11 +382,47 @@ bool EXPRESSION::decide() {
         with_memory = true;
         if (!may_be_redundant()) return false;
     }
-    find_availability();
-    find_placement();
-    find_insertions();
+    compute_AVOUT();
+    compute_PPIN();
+    compute_INSERT();
     find_saves();
     return !replace.empty() && pays();
+}
+
+// ---- Checks and dumps
+
+bool EXPRESSION::is_given_where_deleted(int number) {
+    bool is_given = true;
+    int last = 0;
+    for (const TRIPLE_SITE* site : replace) {
+        if (site->block == last || !is_redundant_in(site->block)) continue;
+        last = site->block;
+        for (const EDGE* p = site->bb->predecessors; p; p = p->rest) {
+            auto is_edge = [&](const EDGE_PLACE& e) { return e.from == p->first && e.to == site->bb; };
+            if (is_available_at_exit(p->first) || is_placed_through(p->first)) continue;
+            if (std::find(insert_at_end.begin(), insert_at_end.end(), p->first) != insert_at_end.end()) continue;
+            if (std::any_of(insert_on_edge.begin(), insert_on_edge.end(), is_edge)) continue;
+            debug_printf("\n\n!!! GCSE(): <%d> is DELETE-AVOUT||INSERT in BB %d %s\n", number, site->block,
+                         tree_to_infix(t.tree).c_str());
+            is_given = false;
+        }
+    }
+    return is_given;
+}
+
+// By block, what holds of the expression: its number, or nothing.
+void EXPRESSION::dump_annotations(int number) {
+    auto line = [number](const char* format, bool holds) {
+        debug_printf(format, holds ? ("{" + std::to_string(number) + "}").c_str() : "{}");
+    };
+    for (int b : region) {
+        debug_printf("\n\nMore global dataflow data for BB->DFN %d\n", b);
+        line("   ALTERED:\t%s\n", at(b) & ALTERED);
+        line("   PPIN:\t%s\n", at(b) & PPIN);
+        line("   PPOUT:\t%s\n", is_placed_at_exit(bb(b)));
+        line("   INSERT:\t%s\n", std::find(insert_at_end.begin(), insert_at_end.end(), bb(b)) != insert_at_end.end());
+        line("   DELETE:\t%s\n", is_redundant_in(b));
+    }
 }
 
 // ---- Rewriting
@@ -397,6 +438,7 @@ private:
     bool is_worth_a_look(const TRIPLE& t) const;
     bool is_induction(const TRIPLE& t) const;
     void apply(const EXPRESSION& e, const TRIPLE& t);
+    void insert_useful_blocks();
     void finish();
 
     EXPRESSION::FUNCTION function;
@@ -529,13 +571,19 @@ void GLOBAL_CSE::apply(const EXPRESSION& e, const TRIPLE& t) {
     }
 }
 
-void GLOBAL_CSE::finish() {
-    for (BBLK* b = currfuninfo->bb_list; b; b = b->dflink) insert_statements_ahead(b, ahead);
+// Only the edges that a computation is put on are split: a block of its own on any other would be in the way of what
+// follows.
+void GLOBAL_CSE::insert_useful_blocks() {
     for (auto& [edge, assignments] : on_edges) {
         BBLK* between = split_cfg_edge(function.blocks[static_cast<size_t>(edge.first)],
                                        function.blocks[static_cast<size_t>(edge.second)], false);
         for (NODE* t : assignments) insert_at_end_of_body(between, t);
     }
+}
+
+void GLOBAL_CSE::finish() {
+    for (BBLK* b = currfuninfo->bb_list; b; b = b->dflink) insert_statements_ahead(b, ahead);
+    insert_useful_blocks();
     for (NODE* t : taken_away) erase_tree(t);
     if (!on_edges.empty()) renumber_bblocks();
     if (!taken_away.empty()) sym_split(currfuninfo);
@@ -559,7 +607,9 @@ void GLOBAL_CSE::run() {
         keep_what_stands(t);
         if (!is_worth_a_look(t) || is_induction(t)) continue;
         EXPRESSION e(t, function);
-        if (e.decide()) apply(e, t);
+        if (!e.decide() || !e.is_given_where_deleted(static_cast<int>(i))) continue;
+        if (print_debug >= 2) e.dump_annotations(static_cast<int>(i));
+        apply(e, t);
     }
     finish();
 }

@@ -6,6 +6,7 @@
 // for each expression and block: an expression meets few of either.
 #include "OPT5/scalar/gdflow.h"
 
+#include "FPSIM/fpsim.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/alias/points_to.h"
 #include "OPT5/ir/facts.h"
@@ -39,16 +40,23 @@ size_t TREE_KEY_HASH::operator()(const TREE_KEY& k) const {
     return h;
 }
 
+TREE_KEY key_of_FCON(const NODE* t) {
+    const uint16_t* m = t->u.fval->mant;
+    const uint64_t high = uint64_t{m[0]} << 48 | uint64_t{m[1]} << 32 | uint64_t{m[2]} << 16 | m[3];
+    return {FCON, type_code(t->type), high, m[4] << 16 | m[5], t->u.fval->exp * 2 + t->u.fval->sign};
+}
+
 bool op_is_computed(int op) {
     if (op == EXCLAIM || op == SCONV || op == PCONV || op == PMCONV) return true;
     return op_is_arithmetic(op) || op_is_int_compare(op) || op_is_float_compare(op);
 }
 
 int weight_of_operator(const NODE* t) {
-    constexpr int DIVISION = 16;
+    constexpr int DIVISION = 16, CALL_OF_FUNCTION = 8;
     if (t->op == SCONV || t->op == PCONV || t->op == ISP2CHAR || t->op == COMMA || number_of_operands[t->op] == 0)
         return 0;
     if (t->op == DIV || t->op == MOD) return DIVISION;
+    if (op_is_call(t->op)) return CALL_OF_FUNCTION;
     return t->op == UMULT || t->op == STREF ? 2 : 1;
 }
 
@@ -128,6 +136,7 @@ private:
     KNOWN number(const NODE* t);
     KNOWN find(const NODE* t);
     KNOWN number_of_leaf(const NODE* t);
+    KNOWN number_of_call(const NODE* t);
     int number_of_key(const TREE_KEY& key) {
         return numbers.try_emplace(key, static_cast<int>(numbers.size()) + 1).first->second;
     }
@@ -169,6 +178,26 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {
         k.number = number_of_key({NAME, code, identity(t->u.sym), 0, 0});
     else if (t->op == ICON && code)
         k.number = number_of_key({ICON, code, t->u.lval.value, t->u.lval.sign, 0});
+    else if (t->op == FCON && code)
+        k.number = number_of_key(key_of_FCON(t));
+    return k;
+}
+
+ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
+    if (!call_is_pure(t) || !type_code(t->type)) return {};
+    KNOWN k;
+    k.cost = weight_of_operator(t);
+    NODE* list = get_arguments_to_call(t);
+    int arguments = 0;
+    for (int i = 0, n = arg_list_count(list); i < n; ++i) {
+        const KNOWN a = number(arg_list_lookup(list, i));
+        if (a.number == NO_TRIPLE) return {};
+        k.cost += a.cost;
+        k.nodes += a.nodes;
+        arguments = number_of_key({COMMA, 0, 0, arguments, a.number});
+    }
+    if (k.nodes > MOST_NODES) return {};
+    k.number = number_of_key({CALL, type_code(t->type), identity(get_callee_for_call(t)), arguments, 0});
     return k;
 }
 
@@ -179,6 +208,7 @@ ANNOTATOR::KNOWN ANNOTATOR::number(const NODE* t) {
 
 ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
     if (number_of_operands[t->op] == 0 || t->op == NAME) return number_of_leaf(t);
+    if (t->op == CALL) return number_of_call(t);
     const bool is_member = t->op == STDOT || t->op == STREF;
     const bool is_load = t->op == UMULT || is_member;
     if ((!op_is_computed(t->op) && !is_load && t->op != UAND && t->op != ISP2CHAR) ||
@@ -208,9 +238,9 @@ TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
     t.tree = const_cast<NODE*>(tree);
     t.cost = cost;
     for_each_subtree(tree, [&t](const NODE* n) {
-        if (n->op == DIV || n->op == MOD) t.may_trap = true;
+        if (n->op == DIV || n->op == MOD || n->op == CALL) t.may_trap = true;
         if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
-        if (n->op != NAME || !n->u.sym) return;
+        if (n->op != NAME || !n->u.sym || n->u.sym->is_function()) return;
         if (!only_its_name_reaches(n->u.sym)) // an address of it costs nothing to ask about
             t.reads_memory = true;
         else if (std::find(t.variables.begin(), t.variables.end(), n->u.sym) == t.variables.end())
@@ -264,7 +294,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
     case SWITCH: return read_operands(t->left, true);
     case CALL: return read_operands(t, true);
     default:
-        if (t->right->op == CALL || t->op == STASG)
+        if ((t->right->op == CALL && !call_is_pure(t->right)) || t->op == STASG)
             read_operands(t->right, true);
         else
             read(t->right, true);
@@ -287,6 +317,9 @@ void annotate_cfg() {
     clean_up_gdflow_bitvecs();
     need(fact::alias | fact::block_numbers | fact::points_to);
     ANNOTATOR().run();
+    if (!print_debug) return;
+    for (size_t i = 0; i < unique_triples.size(); ++i)
+        debug_printf("\tTriple <%d>:\t----    %s\n", static_cast<int>(i), tree_to_infix(unique_triples[i].tree).c_str());
 }
 
 void clean_up_gdflow_bitvecs() {

@@ -42,6 +42,8 @@ constexpr size_t MOST_LOADS = 32, MOST_HOLDERS = 4;
 constexpr int MOST_NODES = 64; // of a tree that is worth looking for
 constexpr double COST_OF_ASSIGNMENT = 1;
 
+bool op_is_load(int op) { return op == UMULT || op == STDOT || op == STREF; }
+
 bool is_assignment_of_private_name(const NODE* t) {
     return (t->op == ASG || is_operator_assignment(t)) && is_private_name(t->left) && !tree_has_side_effects(t->right);
 }
@@ -127,6 +129,7 @@ private:
     VALUE of_load(const NODE* t);
     VALUE of_operator(const NODE* t);
     VALUE of_address(const NODE* place);
+    VALUE of_call(const NODE* t);
     TREE_KEY key_of_load(const NODE* t);
 
     VALUE computed_as(const TREE_KEY& key) {
@@ -174,12 +177,13 @@ VALUE NUMBERS::find(const NODE* t) {
     switch (t->op) {
     case NAME: return of_name(t);
     case ICON: return type_code(t->type) ? computed_as({ICON, type_code(t->type), t->u.lval.value, 0, 0}) : fresh();
-    case FCON: return fresh();
+    case FCON: return type_code(t->type) ? computed_as(key_of_FCON(t)) : fresh();
     case UAND: return of_address(t->left);
     case UMULT:
     case STDOT:
     case STREF: return of_load(t);
     case ISP2CHAR: return t->left->type->is_pointer() && t->type->is_pointer() ? of(t->left) : fresh();
+    case CALL: return call_is_pure(t) ? of_call(t) : fresh();
     default: return op_is_computed(t->op) ? of_operator(t) : fresh();
     }
 }
@@ -199,6 +203,15 @@ VALUE NUMBERS::of_operator(const NODE* t) {
     if (commute_inv[t->op] == t->op && b < a) std::swap(a, b);
     // What a compare compares, and a cast converts from, its own type does not tell.
     return computed_as({t->op, code, t->type->is_pointer() ? 0 : from, a, b});
+}
+
+VALUE NUMBERS::of_call(const NODE* t) {
+    if (!type_code(t->type)) return fresh();
+    NODE* list = get_arguments_to_call(t);
+    VALUE arguments = 0;
+    for (int i = 0, n = arg_list_count(list); i < n; ++i)
+        arguments = computed_as({COMMA, 0, 0, arguments, of(arg_list_lookup(list, i))});
+    return computed_as({CALL, type_code(t->type), identity(get_callee_for_call(t)), arguments, 0});
 }
 
 VALUE NUMBERS::of_address(const NODE* place) {
@@ -346,7 +359,7 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
 }
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
-    return t->op == ASG && is_private_name(t->left) && t->right->op != CALL &&
+    return t->op == ASG && is_private_name(t->left) && (t->right->op != CALL || call_is_pure(t->right)) &&
            type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->type) &&
            numbers.of(t->right) == numbers.of(t->left);
 }
@@ -364,7 +377,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     }
     VALUE v = 0;
     const bool is_plain = t->op == ASG || t->op == STASG;
-    if (t->right->op == CALL || t->op == STASG) {
+    if ((t->right->op == CALL && !call_is_pure(t->right)) || t->op == STASG) {
         read_operands(t->right, true);
         if (t->op == ASG) v = numbers.fresh(); // a call's
     } else {
@@ -485,7 +498,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
     }
     NODE* t = slot;
     if (!good_CSE_tree(t, false) || !type_code(t->type)) return false;
-    if (!op_is_computed(t->op) && t->op != UMULT && t->op != STDOT && t->op != STREF && t->op != NAME) return false;
+    if (!op_is_computed(t->op) && !op_is_load(t->op) && t->op != NAME && !call_is_pure(t)) return false;
     const VALUE v = numbers.of(t);
     OCCURRENCES& known = values[v];
     if (SYMTAB* holder = holder_of(known, v, t->type)) {

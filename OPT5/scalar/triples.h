@@ -33,6 +33,7 @@ struct TREE_KEY_HASH {
 };
 inline uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); }
 
+TREE_KEY key_of_FCON(const NODE* t);  // its bits
 bool op_is_computed(int op); // an operator on values whose result they decide
 // What an operator costs beside its operands, a load included; casts, leaves and addresses are free.
 int weight_of_operator(const NODE* t);
@@ -62,7 +63,7 @@ struct TRIPLE_SITE {
 struct TRIPLE {
     NODE* tree = nullptr; // its first occurrence, borrowed
     double cost = 0;
-    bool may_trap = false; // a division, or a load through a pointer
+    bool may_trap = false; // a division, a load through a pointer, or a call
     bool reads_memory = false;
     std::vector<const SYMTAB*> variables; // private ones that it reads
     std::vector<TRIPLE_SITE> sites;       // in the order of blocks and statements

@@ -6,7 +6,7 @@
 
 void use(int x);
 int check(int b);
-int hits;
+int hits, cell, *volatile pc = &cell;
 void use(int x) { hits += x; }
 int check(int b) { if (b == 0) { put_i16(-1); exit(0); } return b; }
 
@@ -58,6 +58,42 @@ int divides(int n, int b) {
     return s;
 }
 
+// The same of a call that only computes.
+int quotient(int n, int b) { return n / b + n; }
+// FUNCTION: divides_by_call
+// HAS: _check(b)
+// HAS: /_quotient\(/
+int divides_by_call(int n, int b) {
+    int i, s = 0;
+    for (i = 0; i < n; i++) { check(b); s += quotient(n, b) ^ i; }
+    return s;
+}
+
+// FUNCTION: calls_on_both_arms
+// COUNT 2: _quotient(
+int calls_on_both_arms(int a, int b, int c) {
+    int x;
+    if (c > 0) x = quotient(a, b); else { use(quotient(a, b) + 1); x = 1; }
+    use(c);
+    return x + quotient(a, b);
+}
+
+// Bit-fields of one container, and a variable that a pointer reaches.
+struct BITS { unsigned a : 4, b : 5; } bits;
+unsigned parts(struct BITS *p, struct BITS *q, int c) {
+    unsigned x = p->a * 3u;
+    if (c) use(x);
+    q->b = c; q->a += 1;
+    if (c > 1) use(p->a * 3u);
+    return x + p->a * 3u + p->b;
+}
+int reached(int a, int b, int c) {
+    int v = a, *q = c > 1 ? &v : &cell, x = v * b * 3;
+    if (c) use(x);
+    *q = c;
+    return x ^ v * b * 3;
+}
+
 // A shift or a compare of another sign is another computation.
 int signs(int a, unsigned u, int c) {
     int x = a >> 1, y;
@@ -68,7 +104,6 @@ int signs(int a, unsigned u, int c) {
 }
 
 struct S { int a, b[3]; } gs;
-int cell, *volatile pc = &cell;
 // Stores of structures, copies of memory, calls and unknown pointers change what is read.
 int changes_of_memory(struct S *s, struct S *t, int *p, int c) {
     int x = s->b[1] * 3, y, z, w;
@@ -132,9 +167,11 @@ int main(void) {
         put_i16(critical_edges(c, 6, c));
         put_i16(changes_of_memory(&s, &t, &s.b[1], c));
         s.b[1] = c;
+        put_i16(calls_on_both_arms(c, 7, c)); put_i16(parts(&bits, &bits, c)); put_i16(reached(c, 5, c));
     }
     tab[1] = &cell;
     put_i16(closed_by_its_test(30)); put_i16(cell);
+    put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));
     return 0;

@@ -55,6 +55,30 @@ int operands_change(int a, int b) {
     return x - y + a++ + (a + b);
 }
 
+// Calls that only compute are made once; not what reads memory that changes, or a volatile object.
+int cube(int x) { return x * x * x + x / 3; }
+float scaled(float x) { return x * 1.5f + 2.0f; }
+int reads_g(int x) { return x + g; }
+int samples(void) { return port; }
+// FUNCTION: pure_calls
+// COUNT 1: _cube(
+// COUNT 1: _scaled(
+int pure_calls(int a, int *p) {
+    int s = cube(a);
+    *p = s;
+    g += s;
+    if (scaled(2.0f) > 4.0f && scaled(2.0f) < 6.0f) s += cube(a) * 3;
+    return s;
+}
+// FUNCTION: other_calls
+// COUNT 2: _samples(
+// COUNT 2: _reads_g(
+int other_calls(int a) {
+    int s = reads_g(a) + samples();
+    g += 1;
+    return s + reads_g(a) - samples();
+}
+
 // Accesses a constant apart share the sum of base and index.
 struct T { int a; long b; } tab[6];
 // FUNCTION: neighbours
@@ -104,6 +128,7 @@ int main(void) {
         put_i16(only_on_one_path(c, 6)); put_i16(through_restrict(&g, &h)); put_i16(old_and_new(c, 5));
         tab[c < 0 ? 0 : c].b = c * 70000L; tab[c & 3].a = c; put_i32(neighbours(row + 3, c < 0 ? 1 : c - (c == 4)));
         put_u32(wraps(row, c < 0 ? 65535u : c));
+        put_i16(pure_calls(c, &g)); put_i16(g); put_i16(other_calls(c));
         here = &g - 2; put_i16(self(&pp, &pp));
     }
     return 0;

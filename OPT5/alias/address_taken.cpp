@@ -7,6 +7,7 @@
 
 #include "OPT5/alias/effects.h"
 #include "OPT5/alias/state.h"
+#include "OPT5/target/bif.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/symbol_maps.h"
@@ -48,6 +49,18 @@ bool is_object_itself(const NODE* t) {
     return !is_plain_array(object) && compatible_types(object, t->type, true);
 }
 
+void mark_addressed(const NODE* t, bool is_access_address, int& writes);
+
+// Of the multiply-accumulate hardware: the accumulators that it is handed are registers, whose address nobody has.
+void mark_addressed_by_operands(const NODE* t, int& writes) {
+    SYMTAB* sym = nullptr;
+    if (t->op == COMMA) {
+        mark_addressed_by_operands(t->left, writes);
+        mark_addressed_by_operands(t->right, writes);
+    } else if (!tree_is_IN_OUT_argument(t, &sym))
+        mark_addressed(t, false, writes);
+}
+
 // `is_access_address`: `t` is the pointer of an access, from which the object can be told. Adds the nodes that write to
 // their left operand to `writes`.
 void mark_addressed(const NODE* t, bool is_access_address, int& writes) {
@@ -62,6 +75,10 @@ void mark_addressed(const NODE* t, bool is_access_address, int& writes) {
         case ARASG: // assigns arrays as values
             for (const NODE* side : {t->left, t->right})
                 if (side->op != NAME) mark_addressed(side, false, writes);
+            return;
+        case MCALL:
+            if (is_multiply_accumulate_MCALL(t)) mark_addressed_by_operands(t->left, writes);
+            else mark_addressed(next, false, writes);
             return;
         case UMULT:
             if (is_object_itself(t)) return;

@@ -84,6 +84,10 @@ bool call_may_access(const NODE* call, const NODE* lvalue, const CALL_BITS& bits
     case ICALL: return !writes && any_argument_reaches(call, lvalue, nullptr, false);
     case UICALL: return false; // a value of its operands
     case MEMCPY: return copy_may_access(call, lvalue, writes);
+    case MCALL:
+        // What it writes are its ARGREFs, which the tree shows.
+        if (is_multiply_accumulate_MCALL(call)) return lvalue && any_argument_reaches(call, lvalue, nullptr, false);
+        return machine_call_may_access(call, lvalue);
     default: return machine_call_may_access(call, lvalue);
     }
 }

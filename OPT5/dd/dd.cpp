@@ -13,5 +13,3 @@ void unroll_and_jam_loop_nest(struct LOOP*, bool, bool) {}
 void unroll_loops_for_SP(struct LOOP*) {}
 void interleave_reductions_in_loop(struct LOOP*, bool) {}
 void explode_local_arrays() {}
-void special_DMAC_conversion() {}
-void rotate_loops_for_accumulators() {}

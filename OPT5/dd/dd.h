@@ -37,8 +37,9 @@ void unroll_loops_for_SP(struct LOOP* loop);
 void interleave_reductions_in_loop(struct LOOP* loop, bool recurse);
 void explode_local_arrays();
 
-// Forms of the dual multiply-accumulate and its accumulators.
-void special_DMAC_conversion();
+// Forms of the dual multiply-accumulate, in normal form, and of its accumulators (mac_dual.cpp, mac_rotation.cpp). The first
+// tells whether it converted anything: the hierarchy is stale then.
+bool special_DMAC_conversion();
 void rotate_loops_for_accumulators();
 
 // What the code generator is told (code_generator.cpp, loop_records.cpp, dependence_records.cpp): FUNINFO::code_records.

@@ -127,6 +127,7 @@ void WRAPPER::value(NODE** link) {
     for (; *link;) {
         NODE* t = *link;
         if (is_access(t->op)) return access(link);
+        if (t->op == ARGREF) note_untracked(t->left); // the callee writes it
         if (t->op == UAND || t->op == ARGREF) return operands_of_place(&t->left);
         if (t->op == PPRAGMA || t->op == LABELREF) return;
         if (writes_within(t)) return write_within(link);

@@ -53,6 +53,8 @@ bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
 // What such a row does is for loops alone: a function without needs not be brought into the form of its frame.
 bool L2_with_loops() { return L2() && has_loops(); }
 bool L2_with_loops_for_speed() { return L2_with_loops() && size_speed_goal() >= 4; }
+// A unified memory is on both buses at once.
+bool L2_with_loops_on_dual_hardware() { return L2_with_loops() && cpu_version == 28 && rtc_unified_memory; }
 bool L2_with_assertions() { return L2() && currfuninfo->has_nasserts; }
 bool is_stack_shared() { return L1() || !has_hardware_float(); }
 bool fusion_is_enabled() { return L2() && pass_enable_loop_fusion; }
@@ -167,6 +169,10 @@ void with_hierarchy(F work) {
     if (root()) work();
 }
 
+void DMAC_conversion() {
+    if (special_DMAC_conversion()) drop_hierarchy();
+}
+
 void sink_definitions() {
     if (sink_unused_definitions(root())) drop_hierarchy();
 }
@@ -254,7 +260,7 @@ const ROW steps[] = {
     /* 39 */ {L, "circular_addressing", &D, L2, circular_addressing, none, none},
     /* 40 */ {L, "loop_if_interchange", &D_with_dependence, L2, loop_if_interchange, none, none},
     /* 41 */ {L, "cd_unroll_by_request", &D, L2, cd_unroll_loops_by_request, none, none},
-    /* 42 */ {L, "DMAC_conversion", &D_with_dependence, L2, special_DMAC_conversion, none, none},
+    /* 42 */ {F, "DMAC_conversion", &D, L2_with_loops_on_dual_hardware, [] { with_hierarchy(DMAC_conversion); }, none, graph | alias_marks},
     /* 43 */ {L, "cd_unroll_completely_for_speed", &D, L2, [] { cd_unroll_loops_for_speed(true); }, none, none},
     /* 44 */ {L, "unroll_completely_for_SP", nullptr, always, nothing, none, none},
     /* 45 */ {L, "unroll_and_jam", &D_with_dependence, L2, [] { unroll_and_jam_loop_nest(root(), true, true); }, none, none},
@@ -279,7 +285,7 @@ const ROW steps[] = {
     /* 64 */ {F, "global CP", nullptr, L2_with_branches, [] { unbuild_loop_hierarchy(); copyprop(2); }, none, graph},
     /* 65 */ {F, "late points-to", nullptr, L2_with_branches, late_points_to, none, every},
     /* 66 */ {F, "global CSE", nullptr, L2_with_branches, global_CSE, none, graph},
-    /* 67 */ {L, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, none, none},
+    /* 67 */ {F, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, alias_marks, graph},
     /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph},
     /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph},
     /* 70 */ {L, "DD restructuring", nullptr, always, nothing, none, none},

@@ -102,6 +102,8 @@ uint32_t find_unCSEable_opds(const NODE* call);
 bool is_ICALL_callee(const NODE* call, const char* name, int nargs);
 // An argument that the call reads and writes: stores the symbol behind it.
 bool tree_is_IN_OUT_argument(const NODE* t, SYMTAB** sym);
+// A call of the multiply-accumulate hardware: it acts on its operands alone, in registers.
+bool is_multiply_accumulate_MCALL(const NODE* t);
 bool is_barrier_MCALL(const char* name);    // a name of the source, without its language prefix
 bool MCALL_stands_for_ICALL(const NODE* t); // an MCALL that is to be an ICALL again
 bool is_EFI_MCALL(const NODE* t);

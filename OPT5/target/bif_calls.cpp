@@ -188,6 +188,12 @@ bool tree_is_IN_OUT_argument(const NODE* t, SYMTAB** sym) {
     return true;
 }
 
+bool is_multiply_accumulate_MCALL(const NODE* t) {
+    if (t->op != MCALL) return false;
+    const BIF* bif = find_BIF_descriptor(t->u.name);
+    return bif && bif->has(IS_MULTIPLY_ACCUMULATE);
+}
+
 bool is_barrier_MCALL(const char* name) {
     const BIF* bif = find_target_BIF_descriptor(name);
     return bif && bif->has(IS_BARRIER);

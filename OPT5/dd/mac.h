@@ -1,0 +1,28 @@
+// Multiply-accumulate statements, in the forms that the hardware takes. What it takes is in target/accumulators.h.
+//
+//     acc += P; P = x * y;      __parallel_mpy_add(x, y, acc, P, shift): adds the product of before while it multiplies
+//     a0 += x[0] * y[0]; a1 += x[1] * y[1];                  __dmac(x, y, a0, a1, shift): both halves of 32-bit words
+//
+// Statements are cells of a block's list and change in place.
+#pragma once
+
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/list.h"
+
+// acc += a*b - c*d + e becomes acc += a*b, acc -= c*d, acc += e: one statement behind the other. Whether it was split.
+// Sums of floating-point numbers are split where the program allows them to be regrouped.
+bool split_accumulations_in_stmt(LIST* cell);
+void split_accumulations_in_bb(BBLK* bb); // all but the control statement
+
+// The statement at `cell`, an accumulation of something already multiplied, and the multiplication behind it become one
+// call in its place. With `allow_s16` the accumulator may have 16 bits.
+bool conversion_to_BIF_call_succeeds(LIST* cell, bool allow_s16);
+// Two accumulations of products of neighbouring 16-bit elements, read as 32-bit words, which the caller knows to be aligned.
+bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell);
+
+// acc op= R, where R holds a multiplication: `t = x * y; acc op= R'` with a new t, in two cells from `cell` on. Whether
+// there was one; its temporary.
+SYMTAB* split_out_multiply(LIST* cell);
+
+// An accumulation whose right side holds a multiplication for the hardware, and not the accumulator.
+bool is_mac(const NODE* statement);

@@ -1,0 +1,339 @@
+// Statement pairs that the multiply-accumulate hardware runs at once become calls of their built-in functions.
+//
+// Needs: alias marks. Leaves: what rests on the graph.
+// Sound because a call reads its factors first, then adds the product of before to the accumulator and then stores the new
+// product, in the target's arithmetic, where sums wrap: the order of the two statements. The accumulator and the product are
+// registers that only their names reach, so that no factor is one of them.
+#include "OPT5/dd/mac.h"
+
+#include "OPT5/dd/dd.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/symtab.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
+#include "OPT5/target/accumulators.h"
+#include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
+
+#include <string>
+#include <utility>
+
+namespace {
+
+constexpr int HIGH_HALF = 32;
+
+bool is_signed(const TYPE* t, uint64_t bits) { return t->is_int() && t->is_signed() && t->size == bits; }
+bool is_float(const TYPE* t, uint64_t bits) { return t->is_float() && t->size == bits; }
+
+NODE** below_conversion(NODE** link, uint64_t to, uint64_t from) {
+    NODE* t = *link;
+    return t->op == SCONV && is_signed(t->type, to) && is_signed(t->left->type, from) ? &t->left : link;
+}
+const NODE* without_conversion(const NODE* t, uint64_t to, uint64_t from) {
+    return *below_conversion(const_cast<NODE**>(&t), to, from);
+}
+
+bool is_loaded(const NODE* t, uint64_t bits) { return t->op == UMULT && is_signed(t->type, bits); }
+bool is_accumulation(const NODE* t) {
+    return (t->op == PLUSASG || t->op == MINUSASG) && is_a_likely_zelkova_accumulator(t->left, false);
+}
+bool is_constant_shift(const NODE* t, long least, long most) {
+    return t->op == SRL && t->right->op == ICON && t->right->u.lval >= INT65(least) && t->right->u.lval <= INT65(most);
+}
+
+// ---- Where a multiplication stands
+
+// What the hardware's product register holds of x * y.
+enum KIND : uint8_t {
+    NO_PRODUCT,
+    HALVES, // of 16-bit factors, all of it
+    LOW,    // of 32-bit factors
+    HIGH,
+    FLOATING,
+};
+
+struct PRODUCT {
+    KIND kind = NO_PRODUCT;
+    NODE** link = nullptr; // holds it; a product mode may stand above
+    NODE* multiply = nullptr; // the MULT itself
+};
+
+bool has_factors(const NODE* m, uint64_t wide, uint64_t bits) {
+    if (m->op != MULT) return false;
+    const NODE *a = without_conversion(m->left, wide, bits), *b = without_conversion(m->right, wide, bits);
+    return is_signed(a->type, bits) && is_signed(b->type, bits) && (is_loaded(a, bits) || is_loaded(b, bits));
+}
+
+// The 32-bit value of the product of 32-bit factors that `link` holds.
+PRODUCT long_product(NODE** link) {
+    NODE* t = *link;
+    if (is_signed(t->type, 32) && has_factors(t, 64, 32)) return {LOW, link, t};
+    if (t->op != SCONV || !is_signed(t->type, 32) || !is_signed(t->left->type, 64)) return {};
+    NODE* inner = t->left;
+    if (has_factors(inner, 64, 32)) return {LOW, link, inner};
+    if (is_constant_shift(inner, HIGH_HALF, HIGH_HALF + 6) && is_signed(inner->left->type, 64) &&
+        has_factors(inner->left, 64, 32))
+        return {HIGH, link, inner->left};
+    return {};
+}
+
+PRODUCT product_in(NODE** link) {
+    NODE* t = *link;
+    const bool is_double = is_float(t->type, 64);
+    if (is_double || is_float(t->type, 32)) {
+        const bool multiplies = t->op == MULT && equiv_mtypes(t->left->type, t->type) && equiv_mtypes(t->right->type, t->type);
+        const bool has_unit = is_double ? is_fpu64 : has_hardware_float();
+        return multiplies && has_unit ? PRODUCT{FLOATING, link, t} : PRODUCT{};
+    }
+    if (!is_signed(t->type, 32)) return {};
+    // x << 3 of a value in memory is a product with 8.
+    if (t->op == SLL && is_loaded(t->left, 32) && t->right->op == ICON && t->right->u.lval >= INT65(2) &&
+        t->right->u.lval < INT65(31)) {
+        t->op = MULT;
+        t->right->u.lval = INT65(1) << t->right->u.lval;
+        t->right->type = tp->long_t;
+    }
+    if (PRODUCT p = long_product(link); p.kind != NO_PRODUCT) return p;
+    if (NODE** m = below_conversion(link, 32, 16); m != link)
+        return has_factors(*m, 16, 16) ? PRODUCT{HALVES, link, *m} : PRODUCT{};
+    int shift = 0;
+    const NODE* below = strip_right_shift(strip_left_shift(t, &shift), &shift);
+    if (below != t && (below != t->left || !is_signed(below->type, 32))) return {};
+    NODE** place = below == t ? link : &t->left;
+    if (has_factors(*place, 32, 16)) return {HALVES, place, *place};
+    return below == t ? PRODUCT{} : long_product(place);
+}
+
+} // namespace
+
+bool is_mac(const NODE* t) {
+    if (!is_accumulation(t) || sym_appears_in_tree(t->left->u.sym, t->right)) return false;
+    return product_in(const_cast<NODE**>(&t->right)).kind != NO_PRODUCT;
+}
+
+// ---- Splitting
+
+namespace {
+
+bool holds_product(NODE* t) {
+    if (product_in(&t).kind != NO_PRODUCT) return true;
+    return (t->op == PLUS || t->op == MINUS) && (holds_product(t->left) || holds_product(t->right));
+}
+
+bool may_be_regrouped(const TYPE* t) { return t->is_int() || fp_add_is_associative(); }
+
+} // namespace
+
+bool split_accumulations_in_stmt(LIST* cell) {
+    cell->first = normalize_zelkova_accumulation(cell->first);
+    NODE* t = cell->first;
+    if (!is_accumulation(t) || !may_be_regrouped(t->left->type) || sym_appears_in_tree(t->left->u.sym, t->right)) return false;
+    bool any = false;
+    for (NODE* sum = t->right; sum->op == PLUS || sum->op == MINUS; sum = t->right) {
+        const bool is_split = (holds_product(sum->left) || holds_product(sum->right)) && equiv_mtypes(sum->type, t->type) &&
+                              equiv_mtypes(sum->left->type, t->type) && equiv_mtypes(sum->right->type, t->type) &&
+                              !tree_has_side_effects(sum);
+        if (!is_split) break;
+        const int op = (t->op == PLUSASG) == (sum->op == PLUS) ? PLUSASG : MINUSASG;
+        insert_behind(cell, maketree(op, copy_tree(t->left), sum->right, t->type, t->ls), cell->psn);
+        t->right = sum->left;
+        erase_node(sum);
+        any = true;
+    }
+    return any;
+}
+
+void split_accumulations_in_bb(BBLK* bb) {
+    for (LIST* s = bb->statements; s && s->rest; s = s->rest) split_accumulations_in_stmt(s);
+}
+
+// The high half is what the product register holds of a 64-bit product; the rest of the shift is its mode.
+SYMTAB* split_out_multiply(LIST* cell) {
+    NODE* t = cell->first;
+    const PRODUCT p = product_in(&t->right);
+    if (p.kind == NO_PRODUCT) return nullptr;
+    TYPE* type = t->left->type->stqs();
+    SYMTAB* temp = sym_temp('T', -1, type, nullptr);
+    NODE* product = *p.link;
+    *p.link = mk_NAME(temp);
+    if (p.kind == HIGH) {
+        NODE* shift = product->left->right;
+        if (const INT65 rest = shift->u.lval - INT65(HIGH_HALF); !rest.is_zero())
+            *p.link = maketree(SRL, *p.link, mk_ICON(rest, tp->int_t), type);
+        shift->u.lval = INT65(HIGH_HALF);
+    }
+    NODE* accumulation = cell->first;
+    cell->first = mk_ASG(mk_NAME(temp), coerce_to_type(type, product));
+    insert_behind(cell, accumulation, cell->psn);
+    return temp;
+}
+
+// ---- Calls
+
+namespace {
+
+NODE* reference_to(const NODE* name) {
+    OPT_ASSERT(name->op == NAME && is_a_likely_zelkova_register(name->u.sym));
+    return maketree(ARGREF, copy_tree(name), nullptr, tp->mk_ptr(name->type));
+}
+
+NODE* chain(std::initializer_list<NODE*> args) {
+    NODE* list = nullptr;
+    for (NODE* arg : args) list = list ? maketree(COMMA, list, arg, tp->int_t) : arg;
+    return list;
+}
+
+NODE* take(NODE** link) {
+    NODE* t = *link;
+    *link = nullptr;
+    return t;
+}
+
+// Takes the place of two statements, whose trees the caller no longer needs.
+void set_call(LIST* cell, const std::string& name, NODE* args) {
+    erase_tree(cell->first);
+    cell->first = mk_MCALL(name.c_str(), args, tp->void_t);
+    drop_statement_behind(cell);
+}
+
+struct PAIR {
+    NODE* accm;      // acc op= P, or a product mode of P
+    NODE* mult;      // P = x * y
+    NODE* p;         // NAME P, in accm
+    int shift = 0;   // the product mode
+    bool adds() const { return accm->op == PLUSASG; }
+};
+
+bool read_pair(LIST* cell, bool allow_s16, PAIR* pair) {
+    NODE *accm = cell->first, *mult = cell->rest->first;
+    if ((accm->op != PLUSASG && accm->op != MINUSASG) || mult->op != ASG) return false;
+    if (!is_a_likely_zelkova_accumulator(accm->left, allow_s16) || !is_a_likely_zelkova_accumulator(mult->left, false))
+        return false;
+    int shift = 0;
+    const NODE* p = strip_right_shift(strip_left_shift(accm->right, &shift), &shift);
+    if (p->op != NAME || p->u.sym != mult->left->u.sym || p->u.sym == accm->left->u.sym) return false;
+    if (!equiv_mtypes(p->type, mult->left->type) || !equiv_mtypes(accm->left->type, p->type)) return false;
+    if (sym_appears_in_tree(accm->left->u.sym, mult->right) || tree_has_side_effects(mult->right)) return false;
+    *pair = {accm, mult, const_cast<NODE*>(p), shift};
+    return shift <= 6;
+}
+
+// The factor from memory goes first.
+void order_factors(NODE** x, NODE** y, uint64_t bits) {
+    if (!is_loaded(*x, bits)) std::swap(*x, *y);
+}
+
+bool convert_product(LIST* cell, PAIR& pair) {
+    const PRODUCT product = product_in(&pair.mult->right);
+    const bool is_whole = product.kind != NO_PRODUCT && product.link == &pair.mult->right;
+    if (!is_whole || product.kind == FLOATING || !is_signed(pair.p->type, 32)) return false;
+    if (product.kind == HIGH && !is_constant_shift(pair.mult->right->left, HIGH_HALF, HIGH_HALF)) return false;
+    const uint64_t bits = product.kind == HALVES ? 16 : 32;
+    NODE* m = product.multiply;
+    NODE** a = below_conversion(&m->left, 2 * bits, bits);
+    NODE** b = below_conversion(&m->right, 2 * bits, bits);
+    const bool is_square = bits == 16 && trees_are_congruent(*a, *b, false) && !lvalue_is_volatile(*a);
+    NODE *x = take(a), *y = take(b);
+    order_factors(&x, &y, bits);
+    NODE *acc = reference_to(pair.accm->left), *p = reference_to(pair.mult->left);
+    NODE* shift = mk_ICON(pair.shift, tp->int_t);
+    std::string name = is_square ? "__parallel_sqr_" : "__parallel_mpy_";
+    name += pair.adds() ? "add" : "sub";
+    if (bits == 32) name += product.kind == HIGH ? "_s32_hi" : "_s32_lo";
+    if (is_square) erase_tree(y);
+    set_call(cell, name, is_square ? chain({x, acc, p, shift}) : chain({x, y, acc, p, shift}));
+    return true;
+}
+
+// Two factors from memory take both buses of a unified memory; none takes neither.
+bool convert_float(LIST* cell, PAIR& pair) {
+    NODE* m = pair.mult->right;
+    const PRODUCT product = product_in(&pair.mult->right);
+    if (product.kind != FLOATING || !pair.adds() || pair.accm->right != pair.p) return false;
+    const bool a = m->left->op == UMULT, b = m->right->op == UMULT;
+    if (a != b || (a && !rtc_unified_memory)) return false;
+    const char* name = m->type->size == 64 ? "__parallel_mpy_add_f64" : "__parallel_mpy_add_f32";
+    NODE *x = take(&m->left), *y = take(&m->right);
+    set_call(cell, name, chain({x, y, reference_to(pair.accm->left), reference_to(pair.mult->left)}));
+    return true;
+}
+
+} // namespace
+
+bool conversion_to_BIF_call_succeeds(LIST* cell, bool allow_s16) {
+    if (!cell || !cell->rest) return false;
+    if (print_debug) debug_printf("~~~#C2BIF#1 %s\n", stmt2infix(cell->first).c_str());
+    if (is_mac(cell->first) && is_mac(cell->rest->first)) return conversion_to_s32xs32_DMAC_succeeds(cell);
+    PAIR pair;
+    if (!read_pair(cell, allow_s16, &pair)) return false;
+    if (print_debug) debug_printf("~~~#C2BIF#2 %s\n", stmt2infix(pair.mult).c_str());
+    return convert_product(cell, pair) || convert_float(cell, pair);
+}
+
+// ---- Both halves at once
+
+namespace {
+
+struct DUAL {
+    NODE* mac[2];
+    NODE** x[2]; // of the UMULT
+    NODE** y[2];
+    int shift[2] = {0, 0};
+};
+
+// acc += x * y, both of 16 bits and from memory.
+bool read_dual(NODE* t, int k, DUAL* d) {
+    if (t->op != PLUSASG || !is_a_likely_zelkova_accumulator(t->left, false) || !is_signed(t->left->type, 32)) return false;
+    const PRODUCT p = product_in(&t->right);
+    if (p.kind != HALVES || p.multiply != *p.link || sym_appears_in_tree(t->left->u.sym, t->right)) return false;
+    strip_right_shift(strip_left_shift(t->right, &d->shift[k]), &d->shift[k]);
+    d->mac[k] = t;
+    d->x[k] = below_conversion(&p.multiply->left, 32, 16);
+    d->y[k] = below_conversion(&p.multiply->right, 32, 16);
+    return is_loaded(*d->x[k], 16) && is_loaded(*d->y[k], 16);
+}
+
+// Whether `b` reads the 16-bit word behind the one that `a` reads.
+bool is_next_word(const NODE* a, const NODE* b) {
+    if (lvalue_is_volatile(a) || lvalue_is_volatile(b)) return false;
+    if (!a->right && !b->right) return tree_difference_is_ivalue(b->left, a->left, INT65(1), nullptr);
+    if (!b->right || !trees_are_congruent(a->left, b->left, false)) return false;
+    return a->right ? tree_difference_is_ivalue(b->right, a->right, INT65(1), nullptr)
+                    : tree_is_ivalue(b->right, INT65(1), nullptr);
+}
+
+// The 32-bit word of which `t` reads the first half.
+NODE* word_at(NODE* t) {
+    TYPE* type = tp->mk_qual(tp->long_t, t->type->qual_kind(true));
+    t->left = coerce_to_type(tp->mk_ptr(type), t->left);
+    t->type = type;
+    return t;
+}
+
+} // namespace
+
+bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell) {
+    if (!cell || !cell->rest || memory_is_big_endian) return false;
+    DUAL d;
+    if (!read_dual(cell->first, 0, &d) || !read_dual(cell->rest->first, 1, &d)) return false;
+    if (print_debug) debug_printf("~~~#DMAC#1 %s\n~~~#DMAC#2 %s\n", stmt2infix(d.mac[0]).c_str(), stmt2infix(d.mac[1]).c_str());
+    if (d.shift[0] != d.shift[1] || d.mac[0]->left->u.sym == d.mac[1]->left->u.sym) return false;
+    for (int k : {0, 1})
+        if (sym_appears_in_tree(d.mac[k]->left->u.sym, d.mac[1 - k]->right) || tree_has_side_effects(d.mac[k]->right)) return false;
+    if (!is_next_word(*d.x[0], *d.x[1]) || !is_next_word(*d.y[0], *d.y[1])) {
+        std::swap(d.x[1], d.y[1]);
+        if (!is_next_word(*d.x[0], *d.x[1]) || !is_next_word(*d.y[0], *d.y[1])) return false;
+    }
+    if (print_debug) debug_printf("~~~#DMAC#11 %s\n", tree_to_infix(*d.x[0]).c_str());
+    NODE *x = word_at(take(d.x[0])), *y = word_at(take(d.y[0]));
+    NODE* args = chain({x, y, reference_to(d.mac[0]->left), reference_to(d.mac[1]->left), mk_ICON(d.shift[0], tp->int_t)});
+    set_call(cell, "__dmac", args);
+    return true;
+}

@@ -1,0 +1,195 @@
+// Loops of one block add the product of the iteration before while they multiply, as one instruction does.
+//
+//     do acc += x * y; while (...);          t = 0; do { acc += t; t = x * y; } while (...); acc += t;
+//
+// and the pair in the loop becomes one call, for the repeat instruction to run.
+//
+// Needs: alias marks. Leaves: the graph, but for exits of loops that it splits.
+// Sound because the accumulator gets the same products in the same order, one iteration late: the zero at first changes
+// nothing (for floating-point sums it is -0.0), and the last one is added behind the loop. Nothing else in the block reads the
+// accumulator, and what else adds to it commutes in arithmetic that wraps. Memory is read where it was.
+#include "OPT5/dd/mac.h"
+
+#include "OPT5/dd/dd.h"
+
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/symtab.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/ir/walks.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/target/accumulators.h"
+
+#include <utility>
+#include <vector>
+
+namespace {
+
+register_option pass_disable_simple_rotation("disable:simple_rotation");
+
+struct ROTATION {
+    BBLK* block;
+    BBLK* exit = nullptr;
+    std::vector<BBLK*> entries; // predecessors outside the loop
+};
+
+// A block that is its own successor, and has one other.
+bool find_rotation(BBLK* bb, ROTATION* r) {
+    const EDGE* e = bb->successors;
+    if (!e || !e->rest || e->rest->rest || ends_in_promise(bb)) return false;
+    if (e->first != bb && e->rest->first != bb) return false;
+    r->block = bb;
+    r->exit = e->first == bb ? e->rest->first : e->first;
+    for (const EDGE* p = bb->predecessors; p; p = p->rest)
+        if (p->first != bb) r->entries.push_back(p->first);
+    return !r->entries.empty();
+}
+
+// ---- How much the block multiplies
+
+// The size of an element scales a subscript by a shift, or by steps of a pointer in the end: no multiplication.
+bool is_scaled_subscript(const NODE* t) { return t->op == MULT && t->right->op == ICON && power_of_2(t->right->u.lval) >= 0; }
+
+int count_multiplies(const NODE* t, bool in_address) {
+    int count = 0;
+    for (; t; t = t->left) {
+        count += t->op == MULT && !(in_address && is_scaled_subscript(t));
+        in_address |= t->op == UMULT || t->op == STREF;
+        count += count_multiplies(t->right, in_address);
+    }
+    return count;
+}
+
+bool doubles(const NODE* t) {
+    return any_subtree(t, [](const NODE* n) { return n->op == MULT && n->right->op == ICON && n->right->u.lval == INT65(2); });
+}
+
+bool is_sum_into_target(const NODE* t) {
+    if (t->op == PLUSASG || t->op == MINUSASG) return true;
+    return t->op == ASG && (t->right->op == PLUS || t->right->op == MINUS) &&
+           (trees_are_congruent(t->left, t->right->left, false) || trees_are_congruent(t->left, t->right->right, false));
+}
+
+// The multiplier is one: a block with more to multiply is no rotation's.
+bool multiplies_once(const BBLK* bb) {
+    int total = 0;
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        const int count = count_multiplies(s->first, false);
+        total += count == 2 && is_sum_into_target(s->first) && doubles(s->first->right) ? 1 : count;
+    }
+    return total == 1;
+}
+
+// ---- One accumulation
+
+// Whether what else the block does with the accumulator commutes with adding to it.
+bool may_be_late(const BBLK* bb, const LIST* cell) {
+    const NODE* acc = cell->first->left;
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        if (s == cell || !sym_appears_in_tree(acc->u.sym, s->first)) continue;
+        const NODE* t = s->first;
+        const bool accumulates = (t->op == PLUSASG || t->op == MINUSASG) && trees_are_congruent(t->left, acc, false) &&
+                                 !sym_appears_in_tree(acc->u.sym, t->right);
+        if (!accumulates || (acc->type->is_float() && !fp_add_is_associative())) return false;
+    }
+    return true;
+}
+
+// What added to, or taken from, any number leaves it as it is.
+NODE* neutral(const NODE* accumulation) {
+    TYPE* type = accumulation->left->type->stqs();
+    NODE* zero = fold_constants(coerce_to_type(type, mk_ICON(INT65(0), tp->int_t)));
+    const bool is_negative = type->is_float() && accumulation->op == PLUSASG;
+    return is_negative ? fold_constants(maketree(UMINUS, zero, nullptr, type)) : zero;
+}
+
+LIST* copy_of_statement(const LIST* cell) {
+    LIST* copy = mkelist(copy_tree(cell->first), nullptr, cell->psn);
+    return copy;
+}
+
+void erase_list(LIST* list) {
+    while (list) {
+        LIST* rest = list->rest;
+        if (list->first) erase_tree(list->first);
+        delete list;
+        list = rest;
+    }
+}
+
+class ROTATOR {
+public:
+    bool run();
+
+private:
+    bool rotate(ROTATION& r);
+    bool rotate(ROTATION& r, LIST* cell);
+
+    bool has_new_temps = false, has_new_blocks = false;
+};
+
+// The statement becomes `acc op= t` and `t = product`, or the call of both.
+bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
+    LIST* pair = copy_of_statement(cell);
+    const SYMTAB* temp = split_out_multiply(pair);
+    if (!temp) {
+        erase_list(pair);
+        return false;
+    }
+    std::swap(pair->first, pair->rest->first);
+    NODE* late = copy_tree(pair->first);
+    NODE* zero = mk_ASG(mk_NAME(const_cast<SYMTAB*>(temp)), neutral(late));
+    const bool is_call = conversion_to_BIF_call_succeeds(pair, false);
+    // Where no instruction does both, an addition beside the multiplication is a gain for the floating-point unit alone.
+    if (!is_call && !late->left->type->is_float()) {
+        erase_list(pair);
+        erase_tree(late);
+        erase_tree(zero);
+        return false;
+    }
+    erase_tree(cell->first);
+    cell->first = std::exchange(pair->first, nullptr);
+    if (pair->rest) insert_behind(cell, std::exchange(pair->rest->first, nullptr), cell->psn);
+    erase_list(pair);
+    for (BBLK* entry : r.entries) insert_at_end_of_body(entry, copy_tree(zero));
+    erase_tree(zero);
+    if (r.exit->predecessors->rest) {
+        r.exit = split_cfg_edge(r.block, r.exit, false);
+        has_new_blocks = true;
+    }
+    insert_before(&r.exit->statements, late, cell->psn);
+    has_new_temps = true;
+    return is_call;
+}
+
+bool ROTATOR::rotate(ROTATION& r) {
+    bool any = false;
+    split_accumulations_in_bb(r.block);
+    for (LIST* s = r.block->statements; s->rest; s = s->rest)
+        if (is_mac(s->first) && may_be_late(r.block, s)) any |= rotate(r, s);
+    return any;
+}
+
+bool ROTATOR::run() {
+    std::vector<BBLK*> blocks;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
+    for (BBLK* bb : blocks) {
+        ROTATION r;
+        if (!find_rotation(bb, &r) || !multiplies_once(bb)) continue;
+        if (!pass_disable_simple_rotation && rotate(r)) continue;
+    }
+    if (has_new_temps) sym_split(currfuninfo);
+    changed(has_new_blocks ? fact::none : fact::graph);
+    return has_new_temps;
+}
+
+} // namespace
+
+void rotate_loops_for_accumulators() {
+    if (opt_level() < 2 || currfuninfo->bb_count < 2) return;
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'ROTATE_LOOPS_FOR_ACCUMULATORS' ----------\n");
+    ROTATOR().run();
+}

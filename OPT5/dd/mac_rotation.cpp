@@ -98,6 +98,56 @@ bool may_be_late(const BBLK* bb, const LIST* cell) {
     return true;
 }
 
+// ---- Squares
+
+int count_of(const SYMTAB* sym, const NODE* t) {
+    int count = 0;
+    for_each_subtree(t, [&](const NODE* n) { count += n->op == NAME && n->u.sym == sym; });
+    return count;
+}
+
+// A variable that the tree multiplies by itself.
+const SYMTAB* squared_variable(const NODE* t) {
+    const SYMTAB* sym = nullptr;
+    for_each_subtree(t, [&sym](const NODE* n) {
+        if (n->op != MULT) return;
+        const NODE *a = n->left, *b = n->right;
+        while (a->op == SCONV) a = a->left;
+        while (b->op == SCONV) b = b->left;
+        if (a->op == NAME && b->op == NAME && a->u.sym == b->u.sym) sym = a->u.sym;
+    });
+    return sym;
+}
+
+// `s = *x; acc += s * s;`, as a load that is needed twice was kept: the hardware squares what it loads.
+void read_square_from_memory(BBLK* bb) {
+    for (LIST** link = &bb->statements; (*link)->rest && (*link)->rest->rest; link = &(*link)->rest) {
+        const NODE* load = (*link)->first;
+        NODE* t = (*link)->rest->first;
+        if (load->op != ASG || load->left->op != NAME || load->right->op != UMULT || !is_sum_into_target(t)) continue;
+        if (!load->right->type->is_int() || load->right->type->size != 16) continue;
+        SYMTAB* sym = load->left->u.sym;
+        if (squared_variable(t->right) != sym || !is_a_likely_zelkova_register(sym) || lvalue_is_volatile(load->right) ||
+            !equiv_mtypes(load->left->type, load->right->type))
+            continue;
+        int elsewhere = -1 - count_of(sym, t);
+        for (const BBLK* other = currfuninfo->bb_list; other; other = other->dflink)
+            for (const LIST* s = other->statements; s; s = s->rest) elsewhere += count_of(sym, s->first);
+        if (elsewhere != 0 || count_of(sym, t) != 2) continue;
+        NODE* name = mk_NAME(sym);
+        NODE* square = copy_tree(t);
+        square->right = subst_tree_for_lvalue_in_tree(load->right, name, square->right);
+        erase_tree(name);
+        std::swap(square, (*link)->rest->first);
+        if (is_mac((*link)->rest->first) && may_be_late(bb, (*link)->rest)) {
+            drop_statement(link);
+        } else
+            std::swap(square, (*link)->rest->first);
+        erase_tree(square);
+        return;
+    }
+}
+
 // What added to, or taken from, any number leaves it as it is.
 NODE* neutral(const NODE* accumulation) {
     TYPE* type = accumulation->left->type->stqs();
@@ -168,6 +218,7 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
 bool ROTATOR::rotate(ROTATION& r) {
     bool any = false;
     split_accumulations_in_bb(r.block);
+    read_square_from_memory(r.block);
     for (LIST* s = r.block->statements; s->rest; s = s->rest)
         if (is_mac(s->first) && may_be_late(r.block, s)) any |= rotate(r, s);
     return any;

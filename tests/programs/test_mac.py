@@ -1,0 +1,161 @@
+"""Loops that multiply and accumulate: which call of the hardware each becomes, and that it computes the same."""
+import re
+import sys
+import tempfile
+import unittest
+from pathlib import Path
+
+HERE = Path(__file__).resolve().parent
+sys.path.insert(0, str(HERE.parent.parent / "tools"))
+from icparse_lib import cli  # noqa: E402
+from zbench import INCLUDE, Tools, difference  # noqa: E402
+
+COUNTS = (0, 1, 2, 3, 4, 5, 16, 17, 64)
+DECLARATIONS = f"""
+#include <zrun.h>
+#pragma DATA_ALIGN(h, 2)
+int h[160];
+#pragma DATA_ALIGN(k, 2)
+int k[160];
+long w[80], v[80], z[80]; float f[80], g[80]; long double d[80], e[80]; unsigned u[80]; volatile int port;
+int n, counts[] = {{{", ".join(map(str, COUNTS))}}};
+void keep(long* p) {{ *p += 1; }}
+void fill(void) {{
+    int i;
+    for (i = 0; i < 160; i++) h[i] = (i * 731 & 4095) - 2048, k[i] = 2047 - (i * 397 & 4095);
+    for (i = 0; i < 80; i++) {{
+        u[i] = i * 111;
+        w[i] = (i * 977L & 32767) - 16384, v[i] = (i * 37 & 255) - 128, z[i] = (i + 5) * 26843545L * (i & 1 ? -1 : 1);
+        f[i] = (i - 31) * .5f, g[i] = i & 3 ? i * .25f : -0.f, d[i] = f[i], e[i] = g[i];
+    }}
+    h[0] = -32768, k[0] = 16384;
+}}
+"""
+WALKS = {  # the loop, and how it names its factors
+    "indexed": ("for (i = 0; i < n; i++)", "p[i]", "q[i]"),
+    "pointers": ("for (i = n; i > 0; i--)", "*p++", "*q++"),
+    "reversed": ("for (i = 0; i < n; i++)", "p[i]", "q[64 - i]"),
+    "counted": ("while (i++ < n)", "*p++", "q[i]"),
+}
+
+
+FLOATS = {"float": "f32", "long double": "f64"}
+
+
+def forms():
+    """Type of the factors, their arrays, what is added, and the call and shift that it becomes."""
+    for op, verb in (("+=", "add"), ("-=", "sub")):
+        for shift in range(-1, 7):
+            mode = " * 2" if shift < 0 else f" >> {shift}" if shift else ""
+            yield "int", "h", "k", f"{op} ((long)X * Y){mode}", f"mpy_{verb}", shift
+            yield "long", "w", "v", f"{op} (X * Y){mode}", f"mpy_{verb}_s32_lo", shift
+            if shift >= 0:
+                yield "long", "z", "w", f"{op} (long)((long long)X * Y >> {32 + shift})", f"mpy_{verb}_s32_hi", shift
+                yield "int", "h", "h", f"{op} ((long)X * X){mode}", f"sqr_{verb}", shift
+    yield "float", "f", "g", "+= X * Y", "mpy_add_f32", None
+    yield "long double", "d", "e", "+= X * Y", "mpy_add_f64", None
+
+
+REFUSED = {  # what a loop does beside, or in place of, what the hardware does
+    "long acc = 0; for (i = 0; i < n; i++) acc += ((long)h[i] * k[i]) >> 7;": "a shift too far",
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)((long long)z[i] * w[i] >> 39);": "a shift too far",
+    "unsigned long acc = 0; for (i = 0; i < n; i++) acc += (unsigned long)u[i] * u[i + 1];": "unsigned",
+    "long acc = 0; for (i = 0; i < n && acc < 100000; i++) acc += (long)h[i] * k[i];": "tested",
+    "long acc = 0; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; w[i] = acc; }": "stored",
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * k[i] + (long)h[i + 1] * k[i + 2];": "two products",
+    "long acc = 0; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; keep(&acc); }": "its address is known",
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * (int)acc;": "a factor",
+    "long long acc = 0; for (i = 0; i < n; i++) acc += (long long)w[i] * v[i];": "64 bits",
+}
+# In a unified memory: the loop, and the call.
+DUAL = {
+    "long acc = 5; for (i = 0; i < 64; i++) acc += (long)h[i] * k[i];": "dmac",
+    "long acc = 5; for (i = 63; i >= 0; i--) acc += (long)h[i] * k[i];": "mpy_add",  # the words' halves are the wrong way about
+    "long acc = 5; for (i = 1; i < 65; i++) acc += (long)h[i] * k[i];": "mpy_add",
+    "long acc = 5; for (i = 0; i < 63; i++) acc += (long)h[i] * k[i];": "mpy_add",
+    "long acc = 5; for (i = 0; i < n; i++) acc += (long)h[i] * k[i];": "mpy_add",
+    "long acc = 5; for (i = 0; i < 62; i++) acc += (long)h[i] * k[i + 2] >> 3;": "dmac",
+    "long acc = 5; int *p = (int*)w, *q = h; for (i = 0; i < 50; i++) acc += (long)*p++ * *q++;": "dmac",
+    "long acc = 0, b = 0; for (i = 0; i < n; i++) { acc += (long)h[2*i] * k[2*i] >> 2; b += (long)h[2*i+1] * k[2*i+1] >> 2; } acc ^= b;": "dmac",
+    "long acc = 0, b = 0; for (i = 0; i < n; i++) { acc += (long)h[2*i] * k[2*i]; b += (long)h[2*i+2] * k[2*i+2]; } acc ^= b;": None,
+}
+
+
+def product_of(form, walk):
+    kind, x, y, added, _, _ = form
+    loop, left, right = WALKS[walk]
+    if x == y and "++" in left:
+        loop, left = "for (i = n; i > 0; i--, p++)", "*p"
+    added = added.replace("X", left).replace("Y", right)
+    result = kind if kind in FLOATS else "long"
+    start = "0" if kind in FLOATS else "5"
+    return f"{result} %s({kind}* p, {kind}* q) {{ {result} acc = {start}; int i = 0; {loop} acc {added}; return acc; }}\n"
+
+
+class Program:
+    def __init__(self, functions, calls):
+        self.source = DECLARATIONS + "".join(functions)
+        loop = "for (j = 0; j < %d; j++) { n = counts[j] >> halved;" % len(COUNTS)
+        self.source += "int main(void) { int j, halved; for (halved = 0; halved < 2; halved++) { fill(); " + loop
+        self.source += " ".join(calls) + " } } return 0; }\n"
+
+    def optimized(self, case, options):
+        """Executes before and after; the dumps of the functions f0, f1..."""
+        tools = Tools()
+        with tempfile.TemporaryDirectory() as folder:
+            path, unit, out = (Path(folder) / name for name in ("p.c", "p.if", "p.opt"))
+            path.write_text(self.source)
+            case.assertEqual(cli.main(["-w", "-I", str(INCLUDE), str(path), "-o", str(unit)]), 0)
+            tools.optimize(unit, out, ["--debug:validate", "--disable_inlining", *options])
+            case.assertIsNone(difference(tools.execute(unit), tools.execute(out, ["--check"])))
+            again = Path(folder) / "again"
+            tools.optimize(out, again, ["--debug:validate", "--disable_inlining", *options])
+            case.assertIsNone(difference(tools.execute(unit), tools.execute(again, ["--check"])))
+            dump = tools.dump(out)
+        parts = {int(p[1]): p[2] for p in re.finditer(r"function _f(\d+):(.*?)end function", dump, re.S)}
+        return [parts[i] for i in range(len(parts))]
+
+
+def calls_in(part):
+    return re.findall(r"(?:__parallel_|__)((?:mpy|sqr)_\w+|dmac)\(.*?(?:, (-?\d+))?\)$", part, re.M)
+
+
+class Mac(unittest.TestCase):
+    def program_of(self, bodies):
+        functions = [f"long f{i}(void) {{ int i; {body} return (long)acc; }}\n" for i, body in enumerate(bodies)]
+        return Program(functions, [f"put_i32(f{i}());" for i in range(len(bodies))])
+
+    def test_each_form_becomes_its_call(self):
+        cases = [(form, walk) for form in forms() for walk in WALKS]
+        functions = [product_of(form, walk) % f"f{i}" for i, (form, walk) in enumerate(cases)]
+        calls = [f"put_{FLOATS.get(c[0][0], 'i32')}(f{i}({c[0][1]}, {c[0][2]}));" for i, c in enumerate(cases)]
+        for options in (["--opt_level=2", "--float_support=fpu64", "--unified_memory"], ["--opt_level=4"],
+                        ["--opt_level=3", "--float_support=fpu32", "--size_speed_goal=5"]):
+            parts = Program(functions, calls).optimized(self, options)
+            if "--unified_memory" not in options:
+                continue
+            for (form, walk), part in zip(cases, parts):
+                with self.subTest(form=form, walk=walk):
+                    shift = "" if form[5] is None else str(form[5])
+                    self.assertEqual(calls_in(part), [(form[4], shift)])
+
+    def test_others_stay_as_they_are(self):
+        parts = self.program_of(REFUSED).optimized(self, ["--opt_level=2"])
+        for (body, reason), part in zip(REFUSED.items(), parts):
+            with self.subTest(reason=reason, body=body):
+                self.assertEqual(calls_in(part), [])
+
+    def test_words_of_two_elements(self):
+        program = self.program_of(DUAL)
+        parts = program.optimized(self, ["--opt_level=2", "--float_support=fpu32", "--unified_memory"])
+        for (body, name), part in zip(DUAL.items(), parts):
+            with self.subTest(body=body):
+                self.assertEqual([call[0] for call in calls_in(part)], [name] if name else [])
+                if name == "dmac" and "64" in body:
+                    self.assertIn('MUST_ITERATE("32", "32", "32")', part)
+        for options in (["--opt_level=2"], ["--opt_level=2", "--unified_memory", "--big_endian"]):
+            self.assertFalse(any("dmac" in part for part in program.optimized(self, options)))
+
+
+if __name__ == "__main__":
+    unittest.main()

@@ -17,7 +17,8 @@ void split_accumulations_in_bb(BBLK* bb); // all but the control statement
 // The statement at `cell`, an accumulation of something already multiplied, and the multiplication behind it become one
 // call in its place. With `allow_s16` the accumulator may have 16 bits.
 bool conversion_to_BIF_call_succeeds(LIST* cell, bool allow_s16);
-// Two accumulations of products of neighbouring 16-bit elements, read as 32-bit words, which the caller knows to be aligned.
+// Two accumulations of products of neighbouring 16-bit elements, read as 32-bit words, which the caller knows to be
+// aligned.
 bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell);
 
 // acc op= R, where R holds a multiplication: `t = x * y; acc op= R'` with a new t, in two cells from `cell` on. Whether

@@ -1,9 +1,9 @@
 // Statement pairs that the multiply-accumulate hardware runs at once become calls of their built-in functions.
 //
 // Needs: alias marks. Leaves: what rests on the graph.
-// Sound because a call reads its factors first, then adds the product of before to the accumulator and then stores the new
-// product, in the target's arithmetic, where sums wrap: the order of the two statements. The accumulator and the product are
-// registers that only their names reach, so that no factor is one of them.
+// Sound because a call reads its factors first, then adds the product of before to the accumulator and then stores the
+// new product, in the target's arithmetic, where sums wrap: the order of the two statements. The accumulator and the
+// product are registers that only their names reach, so that no factor is one of them.
 #include "OPT5/dd/mac.h"
 
 #include "OPT5/dd/dd.h"
@@ -61,7 +61,7 @@ enum KIND : uint8_t {
 
 struct PRODUCT {
     KIND kind = NO_PRODUCT;
-    NODE** link = nullptr; // holds it; a product mode may stand above
+    NODE** link = nullptr;    // holds it; a product mode may stand above
     NODE* multiply = nullptr; // the MULT itself
 };
 
@@ -88,7 +88,8 @@ PRODUCT product_in(NODE** link) {
     NODE* t = *link;
     const bool is_double = is_float(t->type, 64);
     if (is_double || is_float(t->type, 32)) {
-        const bool multiplies = t->op == MULT && equiv_mtypes(t->left->type, t->type) && equiv_mtypes(t->right->type, t->type);
+        const bool multiplies =
+            t->op == MULT && equiv_mtypes(t->left->type, t->type) && equiv_mtypes(t->right->type, t->type);
         const bool has_unit = is_double ? is_fpu64 : has_hardware_float();
         return multiplies && has_unit ? PRODUCT{FLOATING, link, t} : PRODUCT{};
     }
@@ -134,12 +135,13 @@ bool may_be_regrouped(const TYPE* t) { return t->is_int() || fp_add_is_associati
 bool split_accumulations_in_stmt(LIST* cell) {
     cell->first = normalize_zelkova_accumulation(cell->first);
     NODE* t = cell->first;
-    if (!is_accumulation(t) || !may_be_regrouped(t->left->type) || sym_appears_in_tree(t->left->u.sym, t->right)) return false;
+    if (!is_accumulation(t) || !may_be_regrouped(t->left->type) || sym_appears_in_tree(t->left->u.sym, t->right))
+        return false;
     bool any = false;
     for (NODE* sum = t->right; sum->op == PLUS || sum->op == MINUS; sum = t->right) {
-        const bool is_split = (holds_product(sum->left) || holds_product(sum->right)) && equiv_mtypes(sum->type, t->type) &&
-                              equiv_mtypes(sum->left->type, t->type) && equiv_mtypes(sum->right->type, t->type) &&
-                              !tree_has_side_effects(sum);
+        const bool is_split = (holds_product(sum->left) || holds_product(sum->right)) &&
+                              equiv_mtypes(sum->type, t->type) && equiv_mtypes(sum->left->type, t->type) &&
+                              equiv_mtypes(sum->right->type, t->type) && !tree_has_side_effects(sum);
         if (!is_split) break;
         const int op = (t->op == PLUSASG) == (sum->op == PLUS) ? PLUSASG : MINUSASG;
         insert_behind(cell, maketree(op, copy_tree(t->left), sum->right, t->type, t->ls), cell->psn);
@@ -204,10 +206,10 @@ void set_call(LIST* cell, const std::string& name, NODE* args) {
 }
 
 struct PAIR {
-    NODE* accm;      // acc op= P, or a product mode of P
-    NODE* mult;      // P = x * y
-    NODE* p;         // NAME P, in accm
-    int shift = 0;   // the product mode
+    NODE* accm;    // acc op= P, or a product mode of P
+    NODE* mult;    // P = x * y
+    NODE* p;       // NAME P, in accm
+    int shift = 0; // the product mode
     bool adds() const { return accm->op == PLUSASG; }
 };
 
@@ -290,7 +292,8 @@ struct DUAL {
 
 // acc += x * y, both of 16 bits and from memory.
 bool read_dual(NODE* t, int k, DUAL* d) {
-    if (t->op != PLUSASG || !is_a_likely_zelkova_accumulator(t->left, false) || !is_signed(t->left->type, 32)) return false;
+    if (t->op != PLUSASG || !is_a_likely_zelkova_accumulator(t->left, false) || !is_signed(t->left->type, 32))
+        return false;
     const PRODUCT p = product_in(&t->right);
     if (p.kind != HALVES || p.multiply != *p.link || sym_appears_in_tree(t->left->u.sym, t->right)) return false;
     strip_right_shift(strip_left_shift(t->right, &d->shift[k]), &d->shift[k]);
@@ -323,17 +326,20 @@ bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell) {
     if (!cell || !cell->rest || memory_is_big_endian) return false;
     DUAL d;
     if (!read_dual(cell->first, 0, &d) || !read_dual(cell->rest->first, 1, &d)) return false;
-    if (print_debug) debug_printf("~~~#DMAC#1 %s\n~~~#DMAC#2 %s\n", stmt2infix(d.mac[0]).c_str(), stmt2infix(d.mac[1]).c_str());
+    if (print_debug)
+        debug_printf("~~~#DMAC#1 %s\n~~~#DMAC#2 %s\n", stmt2infix(d.mac[0]).c_str(), stmt2infix(d.mac[1]).c_str());
     if (d.shift[0] != d.shift[1] || d.mac[0]->left->u.sym == d.mac[1]->left->u.sym) return false;
     for (int k : {0, 1})
-        if (sym_appears_in_tree(d.mac[k]->left->u.sym, d.mac[1 - k]->right) || tree_has_side_effects(d.mac[k]->right)) return false;
+        if (sym_appears_in_tree(d.mac[k]->left->u.sym, d.mac[1 - k]->right) || tree_has_side_effects(d.mac[k]->right))
+            return false;
     if (!is_next_word(*d.x[0], *d.x[1]) || !is_next_word(*d.y[0], *d.y[1])) {
         std::swap(d.x[1], d.y[1]);
         if (!is_next_word(*d.x[0], *d.x[1]) || !is_next_word(*d.y[0], *d.y[1])) return false;
     }
     if (print_debug) debug_printf("~~~#DMAC#11 %s\n", tree_to_infix(*d.x[0]).c_str());
     NODE *x = word_at(take(d.x[0])), *y = word_at(take(d.y[0]));
-    NODE* args = chain({x, y, reference_to(d.mac[0]->left), reference_to(d.mac[1]->left), mk_ICON(d.shift[0], tp->int_t)});
+    NODE* args =
+        chain({x, y, reference_to(d.mac[0]->left), reference_to(d.mac[1]->left), mk_ICON(d.shift[0], tp->int_t)});
     set_call(cell, "__dmac", args);
     return true;
 }

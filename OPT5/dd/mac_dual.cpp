@@ -1,5 +1,5 @@
-// Loops of one block that multiply and accumulate neighbouring 16-bit elements use the dual hardware, which takes a word of
-// two from each operand.
+// Loops of one block that multiply and accumulate neighbouring 16-bit elements use the dual hardware, which takes a
+// word of two from each operand.
 //
 //     for (i = 0; i < n; i++) acc += x[i] * y[i];
 //
@@ -7,11 +7,10 @@
 //
 //     t = 0; for (i = 0; i < n; i += 2) __dmac(*(long *)&x[i], *(long *)&y[i], acc, t, 0); acc += t;
 //
-// Needs: normal form, the hierarchy with its counts. Leaves: where anything was converted, a graph for which the hierarchy is
-// built anew; promises and counts speak of the new iterations.
-// Sound because every second test would have been true, and the sum is regrouped in arithmetic that wraps. Both addresses move
-// by a whole word an iteration, so that the first one decides about all. On a big-endian memory the halves lie the other
-// way about.
+// Needs: normal form, the hierarchy with its counts. Leaves: where anything was converted, a graph for which the
+// hierarchy is built anew; promises and counts speak of the new iterations. Sound because every second test would have
+// been true, and the sum is regrouped in arithmetic that wraps. Both addresses move by a whole word an iteration, so
+// that the first one decides about all. On a big-endian memory the halves lie the other way about.
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/alias.h"
@@ -132,7 +131,8 @@ std::vector<const SYMTAB*> words_in(const BBLK* bb) {
             (moves && !holds(words, name->u.sym) ? words : others).push_back(name->u.sym);
         });
     }
-    words.erase(std::remove_if(words.begin(), words.end(), [&](const SYMTAB* w) { return holds(others, w); }), words.end());
+    words.erase(std::remove_if(words.begin(), words.end(), [&](const SYMTAB* w) { return holds(others, w); }),
+                words.end());
     return words;
 }
 
@@ -219,7 +219,8 @@ LIST* DUAL_LOOP::two_iterations(const NODE* mac, const std::vector<STEP>& steps,
 }
 
 bool DUAL_LOOP::convert_doubled() {
-    if (!loop->tripFactor || loop->tripFactor->op != ICON || !(loop->tripFactor->u.lval % INT65(2)).is_zero()) return false;
+    if (!loop->tripFactor || loop->tripFactor->op != ICON || !(loop->tripFactor->u.lval % INT65(2)).is_zero())
+        return false;
     std::vector<STEP> steps;
     const NODE* mac = only_mac(steps);
     if (loop->has(LOOP_early_exit) || !mac || !all_are_aligned(mac)) return false;

@@ -6,8 +6,8 @@
 //
 // Needs: alias marks. Leaves: the graph, but for exits of loops that it splits.
 // Sound because the accumulator gets the same products in the same order, one iteration late: the zero at first changes
-// nothing (for floating-point sums it is -0.0), and the last one is added behind the loop. Nothing else in the block reads the
-// accumulator, and what else adds to it commutes in arithmetic that wraps. Memory is read where it was.
+// nothing (for floating-point sums it is -0.0), and the last one is added behind the loop. Nothing else in the block
+// reads the accumulator, and what else adds to it commutes in arithmetic that wraps. Memory is read where it was.
 #include "OPT5/dd/mac.h"
 
 #include "OPT5/dd/dd.h"
@@ -51,7 +51,9 @@ bool find_rotation(BBLK* bb, ROTATION* r) {
 // ---- How much the block multiplies
 
 // The size of an element scales a subscript by a shift, or by steps of a pointer in the end: no multiplication.
-bool is_scaled_subscript(const NODE* t) { return t->op == MULT && t->right->op == ICON && power_of_2(t->right->u.lval) >= 0; }
+bool is_scaled_subscript(const NODE* t) {
+    return t->op == MULT && t->right->op == ICON && power_of_2(t->right->u.lval) >= 0;
+}
 
 int count_multiplies(const NODE* t, bool in_address) {
     int count = 0;
@@ -64,13 +66,15 @@ int count_multiplies(const NODE* t, bool in_address) {
 }
 
 bool doubles(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) { return n->op == MULT && n->right->op == ICON && n->right->u.lval == INT65(2); });
+    return any_subtree(
+        t, [](const NODE* n) { return n->op == MULT && n->right->op == ICON && n->right->u.lval == INT65(2); });
 }
 
 bool is_sum_into_target(const NODE* t) {
     if (t->op == PLUSASG || t->op == MINUSASG) return true;
     return t->op == ASG && (t->right->op == PLUS || t->right->op == MINUS) &&
-           (trees_are_congruent(t->left, t->right->left, false) || trees_are_congruent(t->left, t->right->right, false));
+           (trees_are_congruent(t->left, t->right->left, false) ||
+            trees_are_congruent(t->left, t->right->right, false));
 }
 
 // The multiplier is one: a block with more to multiply is no rotation's.
@@ -127,8 +131,8 @@ void read_square_from_memory(BBLK* bb) {
         if (load->op != ASG || load->left->op != NAME || load->right->op != UMULT || !is_sum_into_target(t)) continue;
         if (!load->right->type->is_int() || load->right->type->size != 16) continue;
         SYMTAB* sym = load->left->u.sym;
-        if (squared_variable(t->right) != sym || !is_a_likely_zelkova_register(sym) || lvalue_is_volatile(load->right) ||
-            !equiv_mtypes(load->left->type, load->right->type))
+        if (squared_variable(t->right) != sym || !is_a_likely_zelkova_register(sym) ||
+            lvalue_is_volatile(load->right) || !equiv_mtypes(load->left->type, load->right->type))
             continue;
         int elsewhere = -1 - count_of(sym, t);
         for (const BBLK* other = currfuninfo->bb_list; other; other = other->dflink)
@@ -193,7 +197,8 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
     NODE* late = copy_tree(pair->first);
     NODE* zero = mk_ASG(mk_NAME(const_cast<SYMTAB*>(temp)), neutral(late));
     const bool is_call = conversion_to_BIF_call_succeeds(pair, false);
-    // Where no instruction does both, an addition beside the multiplication is a gain for the floating-point unit alone.
+    // Where no instruction does both, an addition beside the multiplication is a gain for the floating-point unit
+    // alone.
     if (!is_call && !late->left->type->is_float()) {
         erase_list(pair);
         erase_tree(late);

@@ -16,6 +16,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
+#include "OPT5/simp/range.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/simp/symbolic.h"
 #include "OPT5/target/accumulators.h"
@@ -102,8 +103,9 @@ PRODUCT product_in(NODE** link) {
         t->right->type = tp->long_t;
     }
     if (PRODUCT p = long_product(link); p.kind != NO_PRODUCT) return p;
+    // The hardware's product has 32 bits: of a 16-bit one it must be known that nothing is lost.
     if (NODE** m = below_conversion(link, 32, 16); m != link)
-        return has_factors(*m, 16, 16) ? PRODUCT{HALVES, link, *m} : PRODUCT{};
+        return has_factors(*m, 16, 16) && operation_is_exact(*m, nullptr) ? PRODUCT{HALVES, link, *m} : PRODUCT{};
     int shift = 0;
     const NODE* below = strip_right_shift(strip_left_shift(t, &shift), &shift);
     if (below != t && (below != t->left || !is_signed(below->type, 32))) return {};

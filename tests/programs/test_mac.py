@@ -28,7 +28,7 @@ void fill(void) {{
         w[i] = (i * 977L & 32767) - 16384, v[i] = (i * 37 & 255) - 128, z[i] = (i + 5) * 26843545L * (i & 1 ? -1 : 1);
         f[i] = (i - 31) * .5f, g[i] = i & 3 ? i * .25f : -0.f, d[i] = f[i], e[i] = g[i];
     }}
-    h[0] = -32768, k[0] = 16384;
+    h[0] = -32768, k[0] = 16383;
 }}
 """
 WALKS = {  # the loop, and how it names its factors
@@ -65,6 +65,7 @@ REFUSED = {  # what a loop does beside, or in place of, what the hardware does
     "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * k[i] + (long)h[i + 1] * k[i + 2];": "two products",
     "long acc = 0; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; keep(&acc); }": "its address is known",
     "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * (int)acc;": "a factor",
+    "long acc = 0; for (i = 0; i < n; i++) acc += h[i] * k[i];": "a product of 16 bits",
     "long long acc = 0; for (i = 0; i < n; i++) acc += (long long)w[i] * v[i];": "64 bits",
 }
 # In a unified memory: the loop, and the call.

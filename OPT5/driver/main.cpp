@@ -18,6 +18,7 @@
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
 #include "OPT5/target/target.h"
+#include "OPT5/vp/vp.h"
 #include "TYPES/type.h"
 #include "UTIL/abort.h"
 #include "UTIL/big_stack.h"
@@ -48,6 +49,7 @@ bool optimize_unit(int argc, char** argv) {
     init_fileopts();
     init_BIF_descriptors();
     init_simplifier();
+    install_value_propagation();
     setup_passes(true);
     if (pass_debug_parser) {
         parse_md_file(false);

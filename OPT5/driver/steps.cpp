@@ -52,6 +52,7 @@ bool L2_with_branches_on_28() { return L2_with_branches() && cpu_version == 28; 
 bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
 // What such a row does is for loops alone: a function without needs not be brought into the form of its frame.
 bool L2_with_loops() { return L2() && has_loops(); }
+bool L2_without_loops() { return L2() && !has_loops(); }
 bool L2_with_loops_for_speed() { return L2_with_loops() && size_speed_goal() >= 4; }
 // A unified memory is on both buses at once.
 bool L2_with_loops_on_dual_hardware() { return L2_with_loops() && cpu_version == 28 && rtc_unified_memory; }
@@ -199,9 +200,10 @@ void loop_if_interchange() {
     do_loop_if_interchange(root());
 }
 
-// Only where the frame has built no hierarchy: building one has propagated values already.
+// A hierarchy that is built propagates values by itself.
 void value_propagation() {
-    if (!root()) do_value_propagation();
+    do_value_propagation();
+    if (vp_changed) simpcfg(0, 0);
 }
 
 void nothing() {}
@@ -220,7 +222,7 @@ const ROW steps[] = {
     // kind, name, frame, condition, action, needs, leaves
     /*  0 */ {F, "pass 1 fcp/eda", nullptr, L2, [] { fast_CP(4, 0); elim_dead_assigns(0, 0); }, alias_marks, graph},
     /*  1 */ {F, "pass 1 fast_CP(4,0)", nullptr, L1, [] { fast_CP(4, 0); }, alias_marks, graph},
-    /*  2 */ {L, "value propagation for pass 1", nullptr, L2, [] { init_dd_aliasing(); do_value_propagation(); }, none, none},
+    /*  2 */ {F, "value propagation for pass 1", nullptr, L2, value_propagation, alias_marks, graph},
     /*  3 */ {B, "analyze globals", nullptr, always, analyze_global_symbols, none, none},
     /*  4 */ {B, "detect_recursion", nullptr, always, detect_recursion, none, none},
     /*  5 */ {B, "do_interprocedural_propagation", nullptr, always, do_interprocedural_propagation, none, none},
@@ -274,7 +276,7 @@ const ROW steps[] = {
     /* 53 */ {L, "simplify_useless_loop_clones", nullptr, always, nothing, none, none},
     /* 54 */ {L, "alias_advice", &D_with_dependence, L2, [] { report_ambiguous_aliases(root()); }, none, none},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
-    /* 56 */ {L, "value_propagation", &D, L2, value_propagation, none, none},
+    /* 56 */ {F, "value_propagation", nullptr, L2_without_loops, value_propagation, alias_marks, graph},
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},
     /* 58 */ {F, "SSA_propagate_vector", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
     /* 59 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},

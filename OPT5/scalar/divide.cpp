@@ -27,7 +27,6 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/scalar/eda.h"
-#include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lowering.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
@@ -277,14 +276,6 @@ bool contains_division(NODE* t) {
     return found;
 }
 
-const KNOWN_SIGNS* signs = nullptr; // of the function whose divisions are looked for, where they are known
-
-bool bounds_of_dividend(const NODE* x, INT65* low, INT65* high) {
-    if (!calculate_bounds(x, nullptr, low, high)) return false;
-    if (signs && low->is_negative() && !high->is_negative() && signs->is_nonnegative(x)) *low = INT65(0);
-    return true;
-}
-
 NODE* without_divisions(NODE* t, bool* changed) {
     if (!t || is_left_alone(t)) return t;
     t = spelled_out(t);
@@ -315,7 +306,7 @@ bool find_reciprocal(uint64_t divisor, uint64_t limit, uint64_t product_limit, i
 NODE* warp_DIV_to_MULT(NODE* t) {
     TYPE* type = type_of_division(t);
     INT65 low, high;
-    if (!type || !bounds_of_dividend(t->left, &low, &high) || (low.is_zero() && high.is_zero())) return t;
+    if (!type || !calculate_bounds(t->left, nullptr, &low, &high) || (low.is_zero() && high.is_zero())) return t;
     const INT65 c = t->right->u.lval;
     const long cost = cost_of_sequence(t->op, c, type, low, high);
     if (cost < 0 || cost + cost_for_DIV_to_MULT_expr(t->left) >= cost_of_division(t)) return t;
@@ -335,22 +326,22 @@ NODE* warp_DIV_to_MULT(NODE* t) {
 }
 
 void transform_DIVs_by_ICONs() {
-    std::vector<LIST*> divisions;
-    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s; s = s->rest)
-            if (contains_division(s->first)) divisions.push_back(s);
-    if (divisions.empty()) return;
+    bool found = false, any = false;
+    for (BBLK* bb = currfuninfo->bb_list; bb && !found; bb = bb->dflink)
+        for (LIST* s = bb->statements; s && !found; s = s->rest) found = contains_division(s->first);
+    if (!found) return;
     need(fact::alias_marks);
-    const KNOWN_SIGNS known;
-    signs = &known;
-    bool any = false;
-    for (LIST* s : divisions) {
-        bool changed = false;
-        s->first = without_divisions(s->first, &changed);
-        if (changed) s->first = simp_tree(s->first, nullptr);
-        any |= changed;
-    }
-    signs = nullptr;
+    if (value_walk.begin) value_walk.begin();
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (LIST* s = bb->statements; s; s = s->rest) {
+            if (value_walk.at) value_walk.at(bb, s->first);
+            if (!contains_division(s->first)) continue;
+            bool changed = false;
+            s->first = without_divisions(s->first, &changed);
+            if (changed) s->first = simp_tree(s->first, nullptr);
+            any |= changed;
+        }
+    if (value_walk.end) value_walk.end();
     if (!any) return;
     sym_split(currfuninfo);
     promote_all_embedded_assignments();

@@ -18,6 +18,8 @@
 #include <cstdint>
 #include <vector>
 
+class BBLK;
+class SYMTAB;
 struct LOOP;
 
 // ---- Bounds, both attained or not; the lower is never above the upper.
@@ -26,6 +28,23 @@ INT65 calculate_maxval_for_tree(const NODE* tree, struct LOOP* loop);
 // Both at once; false, and nothing stored, for what is no integer. The form for `type_ops_callbacks` and
 // `bif_callbacks`.
 bool calculate_bounds(const NODE* tree, struct LOOP* loop, INT65* min, INT65* max);
+
+// The values that variables may have at the point of the program that is looked at, as whoever stands there knows them:
+// bounds take them in. Null at other times.
+class VARIABLE_VALUES {
+public:
+    virtual ~VARIABLE_VALUES() = default;
+    virtual bool bounds_of_variable(const SYMTAB* sym, INT65* min, INT65* max) const = 0; // false: its type's
+};
+extern const VARIABLE_VALUES* values_of_variables;
+// Who walks over the statements of the current function in order, and says so ahead of each before it changes it, has the
+// values there. Null until the room that knows is there.
+struct VALUE_WALK {
+    void (*begin)() = nullptr;
+    void (*at)(const BBLK* bb, const NODE* statement) = nullptr;
+    void (*end)() = nullptr;
+};
+extern VALUE_WALK value_walk;
 
 // ---- Sign and zero
 bool tree_is_non_negative(const NODE* tree, struct LOOP* loop);

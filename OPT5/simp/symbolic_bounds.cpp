@@ -386,7 +386,11 @@ private:
     }
 
     static RANGE named(const NODE* t) {
-        const RANGE limits = range_of_type(t->type);
+        RANGE limits = range_of_type(t->type);
+        INT65 min, max;
+        if (values_of_variables && t->u.sym && values_of_variables->bounds_of_variable(t->u.sym, &min, &max) &&
+            t->u.sym->type->size == t->type->size && wraps_signed(t->u.sym->type) == wraps_signed(t->type))
+            limits = both(limits, {to_wide(min), to_wide(max)});
         const SYM_RANGE* known = currfuninfo && currfuninfo->widened ? find_widened_symbol_entry(t->u.sym) : nullptr;
         return known ? both(limits, {to_wide(known->min), to_wide(known->max)}) : limits;
     }
@@ -410,6 +414,9 @@ RANGE range_of_bits(const KNOWN_BITS& k, const TYPE* t) {
 bool is_plain(const NODE* t) { return t->op == NAME || t->op == ICON || t->op == UMULT || op_is_call(t->op); }
 
 } // namespace
+
+const VARIABLE_VALUES* values_of_variables = nullptr;
+VALUE_WALK value_walk;
 
 RANGE range_of_tree(const NODE* tree, struct LOOP* loop) {
     const RANGE r = WALK(loop).of(tree);

@@ -1,4 +1,33 @@
-// Value-set propagation: which integers a variable may hold.
+// Value-set propagation: which integers a variable may hold, at each point of the current function.
+//
+//     vpset.cpp              slices and sets: pure values
+//     vpenv.cpp              environments: what the tracked variables hold, sharing what is equal
+//     vp_eval.cpp            sets of trees, what conditions and statements do to an environment
+//     vp_builtins.cpp        the same of built-in functions
+//     value_propagation.cpp  the fixpoint over the blocks
+//     vp_rewrite.cpp         what the sets settle: rewrites, facts of loops, trip counts
 #pragma once
 
+#include "OPT5/vp/vp_eval.h"
+
+class BBLK;
+class NODE;
+
+// Rewrites the current function by its value sets; where there is a loop hierarchy, its loops learn from them too. Needs
+// alias marks. Blocks and edges stay; conditions that are decided become constants.
 void do_value_propagation();
+void install_value_propagation(); // once: the loop hierarchy, and rooms below that ask for values, find it then
+
+// ---- Environments of blocks, from `construct` to `deconstruct`
+void construct_vpsets_for_cfg(int noLoops);
+void deconstruct_vpsets_for_cfg();
+// At the block's entry, or exit; null where no path leads there, or nothing is known.
+const vpenv* bb_vpenv(const BBLK* bb, bool at_exit);
+
+// ---- Rewriting
+// By an environment that holds while the tree is evaluated. `lvalue`: the tree is a place that is written or has its
+// address taken. The tree is consumed; sets `vp_changed` where something became simpler.
+NODE* prop_values_in_tree(NODE* tree, vpenv env, bool lvalue, BBLK* bb);
+extern bool vp_changed;
+// The predicates that say what is known of the symbol, in new trees; `extra` is joined to the set if it is not null.
+std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extra, SYMTAB* sym);

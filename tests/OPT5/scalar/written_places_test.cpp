@@ -11,7 +11,6 @@
 #include "OPT5/scalar/fcp.h"
 #include "OPT5/scalar/implied_tests.h"
 #include "OPT5/dd/inductions.h"
-#include "OPT5/scalar/known_signs.h"
 #include "OPT5/scalar/lcp.h"
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/dd/merge.h"
@@ -315,17 +314,6 @@ TEST(WrittenPlaces, Renaming) {
         for_each_written_name(w.written, [&](const NODE* n, const NODE*) { names += n->u.sym == read->u.sym; });
         return names > 0;
     });
-}
-
-TEST(WrittenPlaces, Signs) {
-    expect_seen(
-        "what is known of signs",
-        [](WORLD& w) {
-            w.build_store_write_load();
-            init_aliasing_info(false);
-            return !KNOWN_SIGNS().is_nonnegative(w.keep(w.name(w.x)));
-        },
-        true);
 }
 
 TEST(WrittenPlaces, GlobalsOfTheProgram) {

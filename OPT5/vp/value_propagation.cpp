@@ -1,0 +1,519 @@
+// The fixpoint: environments at the entry and the exit of each block.
+//
+// Blocks are evaluated in reverse postorder, those again whose entry has changed, in at most 12 passes. An edge carries
+// the exit environment of its block narrowed by the test there; an edge that no value passes carries nothing. What
+// enters a block is what holds on all edges into it. A set that still grows where a back edge enters is widened, after
+// the fifth member, to the end of its type in the direction it grows in; the loop's test narrows it again on the way
+// round.
+//
+// Needs: block numbers, alias marks; caps need trip counts of the loop hierarchy. Leaves: everything: it only looks.
+// Sound because only a state that a whole pass did not change is used: the first block's entry binds nothing, each
+// entry holds at least what its edges bring, and each exit at least what the block makes of its entry. By induction
+// over the steps of a run, every variable has a member of its set then, however the sets were guessed. One thing is
+// not of that form: the cap of an accumulator. Where a loop has one statement that writes s, s += x, which runs at most
+// T times before the loop ends, s at the head is what it was on entry plus at most T members of x's set; the same
+// induction counts the updates. Without a bound T there is no cap.
+#include "OPT5/vp/vp.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
+#include "OPT5/dd/loop.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
+#include "OPT5/ir/side_table.h"
+#include "UTIL/abort.h"
+
+#include <algorithm>
+#include <memory>
+#include <unordered_map>
+
+namespace {
+
+constexpr int MOST_PASSES = 12;
+constexpr int FIRST_WITHOUT_NARROWING = 8, FIRST_WITHOUT_BOUNDS = 10; // so that the passes come to an end
+constexpr size_t MOST_THRESHOLDS = 24; // of a loop
+constexpr int MOST_RETURNS = 12;       // to a head in one pass
+constexpr long BLOCKS_OF_RETURNS = 32; // gone back over in all, for each block of the function
+constexpr size_t MOST_LISTED_CASES = 16;
+
+// ---- Which symbols
+
+bool is_tracked_global(const SYMTAB* sym) {
+    // In normal form its name stands under an address.
+    return !trees_are_normalized && sym->level == 0 && (sym->sclass == SC_STATIC || sym->sclass == SC_EXTDEF || sym->sclass == SC_EXTERN) &&
+           sym != errno_symbol && !sym->is_function() && !(sym->cqual & CQ_GLOBAL_REGISTER) && !sym->is_clustered &&
+           !sym->type->is_volatile() && !volit_vars && !may_be_reached_by_pointers(sym);
+}
+
+void find_tracked_symbols() {
+    std::vector<SYMTAB*> locals, globals;
+    std::unordered_map<const SYMTAB*, bool> seen; // looked up alone
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            for_each_subtree(static_cast<const NODE*>(s->first), [&](const NODE* t) {
+                if (t->op != NAME || !t->u.sym || !has_vpset(t->u.sym->type)) return;
+                SYMTAB* sym = t->u.sym;
+                if (!seen.try_emplace(sym, true).second) return;
+                if (sym->is_automatic() && only_its_name_reaches(sym)) locals.push_back(sym);
+                if (is_tracked_global(sym)) globals.push_back(sym);
+            });
+    std::sort(locals.begin(), locals.end(), sym_uid_less);
+    std::sort(globals.begin(), globals.end(), sym_uid_less);
+    const size_t first_global = locals.size();
+    locals.insert(locals.end(), globals.begin(), globals.end());
+    init_vpenv_allocation(std::move(locals), first_global);
+}
+
+// ---- Widening
+
+VPSLICE hull_of(const vpset& s) {
+    VPSLICE hull;
+    vpset_compress(&hull, s);
+    return hull;
+}
+
+// A value that the loop compares with, or takes remainders by: a set that grows may come to rest there.
+using THRESHOLDS = std::vector<WIDE>; // ascending
+
+// Towards the next threshold, or the end of the type, in the directions that the set has grown in since `old`.
+vpset grown(const vpset& old, const vpset& all, const TYPE* type, const THRESHOLDS& thresholds) {
+    const RANGE limits = vpset_limits(type);
+    const VPSLICE hull = hull_of(all);
+    if (hull.step == 0) return all;
+    WIDE low = hull.low, high = hull.high;
+    if (low < vpset_minimum(old)) {
+        const auto above = std::upper_bound(thresholds.begin(), thresholds.end(), low);
+        low = above == thresholds.begin() ? limits.min : std::max(limits.min, *(above - 1));
+    }
+    if (high > vpset_maximum(old)) {
+        const auto next = std::lower_bound(thresholds.begin(), thresholds.end(), high);
+        high = next == thresholds.end() ? limits.max : std::min(limits.max, *next);
+    }
+    // Without members in between the next end is that of the type.
+    const VPSLICE s = slice_between(low, high, hull);
+    return vpset(s.low < hull.low || s.high > hull.high ? s : hull);
+}
+
+void add_thresholds(const NODE* tree, THRESHOLDS* thresholds) {
+    for_each_subtree(tree, [thresholds](const NODE* t) {
+        if ((t->op != MOD && t->op != ANDB && !op_is_int_compare(t->op)) || t->right->op != ICON) return;
+        const WIDE c = to_wide(t->right->u.lval);
+        if (t->op == ANDB) return thresholds->push_back(c);
+        thresholds->insert(thresholds->end(), {c - 1, c});
+        thresholds->push_back(t->op == MOD ? 1 - c : c + 1);
+    });
+}
+
+// What takes the place of the set that edges bring into the entry of a block, where it was `old` before.
+vpset widened(const vpset& old, const vpset& now, const TYPE* type, const THRESHOLDS& thresholds, int pass) {
+    if (vpset_is_subset(now, old)) return pass < FIRST_WITHOUT_NARROWING ? now : old;
+    vpset all;
+    if (pass >= FIRST_WITHOUT_BOUNDS) return all; // any value
+    vpset_union(&all, old, now);
+    if (vpset_size(old) < 3 || vpset_size(all) < 5) return all;
+    return grown(old, all, type, thresholds);
+}
+
+// ---- Switches
+
+struct CASES {
+    std::unordered_map<const BBLK*, std::vector<VPSLICE>> values; // looked up alone
+    std::vector<WIDE> listed;                                      // all values, if they are few
+    const BBLK* otherwise = nullptr;
+
+    CASES(const NODE* control) {
+        const TYPE* type = control->left->type;
+        for (const NODE* t = control->right; t; t = t->op == COMMA ? t->left : nullptr)
+            take(t->op == COMMA ? t->right : t, type);
+    }
+    // The values of the cases that lead there.
+    vpset of(const BBLK* bb) const {
+        auto it = values.find(bb);
+        if (it == values.end()) return {};
+        if (it->second.size() <= MOST_LISTED_CASES) return vpset_of(it->second);
+        WIDE low = it->second[0].low, high = low;
+        for (const VPSLICE& s : it->second) low = std::min(low, s.low), high = std::max(high, s.low);
+        return vpset(make_vpslice(low, high, 1));
+    }
+    // The default edge: the selector has none of the values that lead elsewhere.
+    bool without_listed(vpenv* env, const NODE* selector, const BBLK* to) const {
+        if (listed.size() > MOST_LISTED_CASES || values.count(to)) return true;
+        vpset left = vpset_of_tree(selector, *env);
+        for (WIDE v : listed)
+            if (!vpset_is_empty(left) && !vpset_without(&left, vpset(left), v)) return false;
+        return filter_vpenv_by_values(env, selector, left);
+    }
+
+private:
+    void take(const NODE* element, const TYPE* type) {
+        if (element->op == DEFAULT) otherwise = element->left->lbl->bblock;
+        if (element->op != CASE) return;
+        if (element->left->op != ICON) optassert("casenode->left->op == ICON", __FILE__, __LINE__);
+        vpset value(single_slice(to_wide(element->left->u.lval)));
+        truncate_vpset_to_type(&value, type);
+        if (!vpset_is_single(value)) return;
+        values[element->right->lbl->bblock].push_back(value[0]);
+        if (listed.size() <= MOST_LISTED_CASES) listed.push_back(value[0].low);
+    }
+};
+
+// ---- The state
+
+struct EDGE_STATE {
+    int from = 0, to = 0;
+    vpenv env;
+    bool is_passed = false;
+};
+
+struct BLOCK_STATE {
+    BBLK* bb = nullptr;
+    std::vector<VP_EFFECT> effects; // those that are any, the control statement's among them
+    std::vector<size_t> in, out;    // edges
+    bool heads_loop = false;           // a natural one, which
+    std::vector<int> altered;          // changes these, and
+    bool alters_globals = false;
+    THRESHOLDS thresholds; // of the loop
+    std::vector<size_t> capped, updated; // accumulators: of the loop whose head it is; those that it adds to
+    bool closes_cycle = false;      // a back edge enters
+    bool is_due = false, is_reached = false;
+    int returns = 0; // to this head, in the pass
+    vpenv entry, exit;
+};
+
+// A variable that one statement of a loop writes, by adding to it.
+struct ACCUMULATOR {
+    int number;
+    const VP_EFFECT* by;
+    int head;          // of the loop
+    size_t entered_by; // the edge
+    const NODE* amount;
+    bool is_subtracted;
+    WIDE most;     // updates between entries
+    vpset amounts; // of an update; empty: the statement was not reached yet
+};
+
+class VALUE_SETS {
+public:
+    bool find(bool with_loops); // false: no fixpoint
+    const vpenv* of(const BBLK* bb, bool at_exit) const {
+        if (number_of[bb] < 0 || !at(number_of[bb]).is_reached) return nullptr;
+        return at_exit ? &at(number_of[bb]).exit : &at(number_of[bb]).entry;
+    }
+
+private:
+    BLOCK_STATE& at(int number) { return blocks[static_cast<size_t>(number)]; }
+    const BLOCK_STATE& at(int number) const { return blocks[static_cast<size_t>(number)]; }
+    void read_graph();
+    void find_altered();
+    vpenv merged(const BLOCK_STATE& b) const;
+    void find_accumulators();
+    void add_accumulators(size_t block, const VP_EFFECT& effect);
+    bool run_pass(int pass);
+    void evaluate(BLOCK_STATE& b, int pass);
+    bool enter(BLOCK_STATE& b, int pass);
+    vpenv capped(const BLOCK_STATE& b, vpenv env) const;
+    void leave(BLOCK_STATE& b);
+    void leave_by(size_t edge, vpenv env, bool can_be);
+    void update_amounts(const BLOCK_STATE& b, const VP_EFFECT& effect, vpenv env, int pass);
+
+    std::vector<BLOCK_STATE> blocks; // in reverse postorder
+    std::vector<EDGE_STATE> edges;
+    std::vector<ACCUMULATOR> accumulators;
+    SIDE_TABLE<int> number_of{-1};
+    std::unordered_map<const struct LOOP*, std::unordered_map<int, int>> writes; // of symbols; looked up alone
+    bool is_changed = false; // an edge brings something else
+    long returns_left = 0;    // blocks that may be gone back over
+};
+
+void VALUE_SETS::read_graph() {
+    std::vector<BBLK*> order;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) order.push_back(bb);
+    std::stable_sort(order.begin(), order.end(), [](const BBLK* a, const BBLK* b) { return a->dfn < b->dfn; });
+    blocks.resize(order.size());
+    for (size_t i = 0; i < order.size(); ++i) {
+        blocks[i].bb = order[i];
+        number_of[order[i]] = static_cast<int>(i);
+        for (const LIST* s = order[i]->statements; s; s = s->rest) {
+            VP_EFFECT effect(s->first);
+            if (!effect.is_none()) blocks[i].effects.push_back(std::move(effect));
+        }
+    }
+    for (size_t i = 0; i < order.size(); ++i)
+        for (const EDGE* e = order[i]->successors; e; e = e->rest) {
+            const int to = number_of[e->first];
+            blocks[i].out.push_back(edges.size());
+            at(to).in.push_back(edges.size());
+            at(to).closes_cycle |= static_cast<size_t>(to) <= i;
+            edges.push_back({static_cast<int>(i), to, {}, false});
+        }
+}
+
+// What each natural loop changes. Its head dominates it, so that nothing else is changed where a back edge enters.
+void VALUE_SETS::find_altered() {
+    for (const BLOCK_STATE& b : blocks) {
+        const NATURAL_LOOP* innermost = currfuninfo->loops->around(b.bb);
+        THRESHOLDS compared;
+        if (innermost)
+            for (const LIST* s = b.bb->statements; s && compared.size() < MOST_THRESHOLDS; s = s->rest)
+                add_thresholds(s->first, &compared);
+        for (const NATURAL_LOOP* l = innermost; l; l = l->parent) {
+            BLOCK_STATE& head = at(number_of[l->header]);
+            head.heads_loop = true;
+            if (head.thresholds.size() < MOST_THRESHOLDS)
+                head.thresholds.insert(head.thresholds.end(), compared.begin(), compared.end());
+            for (const VP_EFFECT& effect : b.effects) {
+                if (effect.assigned_symbol() >= 0) head.altered.push_back(effect.assigned_symbol());
+                head.altered.insert(head.altered.end(), effect.lost_symbols().begin(), effect.lost_symbols().end());
+                head.alters_globals |= effect.may_lose_globals();
+            }
+        }
+    }
+    for (BLOCK_STATE& b : blocks) {
+        std::sort(b.altered.begin(), b.altered.end());
+        b.altered.erase(std::unique(b.altered.begin(), b.altered.end()), b.altered.end());
+        std::sort(b.thresholds.begin(), b.thresholds.end());
+    }
+}
+
+// ---- Accumulators
+
+void VALUE_SETS::find_accumulators() {
+    for (const BLOCK_STATE& b : blocks)
+        for (const VP_EFFECT& effect : b.effects)
+            for (const struct LOOP* l = b.bb->loop; l && !l->is_root(); l = l->parent) {
+                if (effect.assigned_symbol() >= 0) ++writes[l][effect.assigned_symbol()];
+                for (int number : effect.lost_symbols()) writes[l][number] += 2; // once too often
+            }
+    for (size_t i = 0; i < blocks.size(); ++i)
+        for (const VP_EFFECT& effect : blocks[i].effects)
+            if (effect.assigned_symbol() >= 0) add_accumulators(i, effect);
+    writes.clear();
+}
+
+// For each loop around the statement in which it is the only one that writes its variable.
+void VALUE_SETS::add_accumulators(size_t block, const VP_EFFECT& effect) {
+    constexpr WIDE MOST_UPDATES = static_cast<WIDE>(1) << 40;
+    const int number = effect.assigned_symbol();
+    const SYMTAB* sym = vpenv_store->symbol(number);
+    INDUCTION_UPDATE update;
+    if (!sym->is_automatic() || !has_value_range(sym->type) || sym->type->is_enum() || sym->type->is_bool()) return;
+    WIDE most = 1;
+    for (struct LOOP* l = blocks[block].bb->loop; l && !l->is_root(); l = l->parent) {
+        if (writes[l][number] != 1 || !l->maxTrips || l->maxTrips->op != ICON || !l->preheader) return;
+        if (!update.sym && (!is_induction_update(effect.statement(), &update) || update.sym != sym || !update.amount ||
+                            update.is_narrowed || !has_value_range(update.amount->type)))
+            return;
+        const WIDE trips = to_wide(l->maxTrips->u.lval) + (l->is_bottom_tested() ? 0 : 1);
+        if (trips <= 0 || trips > MOST_UPDATES || most > MOST_UPDATES / trips) return;
+        most *= trips;
+        BLOCK_STATE& head = at(number_of[l->head]);
+        const int from = number_of[l->preheader];
+        for (size_t e : head.in)
+            if (edges[e].from == from) {
+                head.capped.push_back(accumulators.size());
+                blocks[block].updated.push_back(accumulators.size());
+                accumulators.push_back({number, &effect, number_of[l->head], e, update.amount, update.is_subtracted, most, {}});
+            }
+    }
+}
+
+void VALUE_SETS::update_amounts(const BLOCK_STATE& b, const VP_EFFECT& effect, vpenv env, int pass) {
+    for (size_t i : b.updated) {
+        ACCUMULATOR& a = accumulators[i];
+        if (a.by != &effect) continue;
+        vpset amounts = vpset_of_tree(a.amount, env);
+        if (a.is_subtracted) vpset_negative(&amounts, vpset(amounts));
+        if (vpset_equal(amounts, a.amounts)) continue;
+        if (pass >= FIRST_WITHOUT_NARROWING) vpset_union(&amounts, vpset(amounts), a.amounts);
+        a.amounts = amounts;
+        at(a.head).is_due = is_changed = true;
+    }
+}
+
+// What a head's variables were on entry, and no more updates than there are.
+vpenv VALUE_SETS::capped(const BLOCK_STATE& b, vpenv env) const {
+    for (size_t i : b.capped) {
+        const ACCUMULATOR& a = accumulators[i];
+        const EDGE_STATE& edge = edges[a.entered_by];
+        const vpset* on_entry = edge.is_passed ? vpenv_store->find(edge.env, a.number) : nullptr;
+        const vpset* now = vpenv_store->find(env, a.number);
+        if (!on_entry) continue;
+        const TYPE* type = vpenv_store->symbol(a.number)->type;
+        const RANGE limits = vpset_limits(type);
+        vpset cap = *on_entry, sum;
+        if (!vpset_is_empty(a.amounts)) {
+            const WIDE low = std::min(vpset_minimum(a.amounts), static_cast<WIDE>(0)) * a.most,
+                       high = std::max(vpset_maximum(a.amounts), static_cast<WIDE>(0)) * a.most, step = vpset_gcd(a.amounts);
+            if (low == high) continue;
+            vpset_sum(&sum, *on_entry, vpset(slice_between(low, high, {0, step, step})));
+            if (limits.min > vpset_minimum(sum) || vpset_maximum(sum) > limits.max) {
+                // Only numbers that the type cannot hold are left out: of one that wraps there is no cap.
+                if (!wraps_signed(type) || !vpset_within(&cap, sum, limits.min, limits.max)) continue;
+            } else
+                cap = sum;
+        }
+        if (now && !vpset_intersection(&cap, *now, vpset(cap))) continue;
+        env = vpenv_store->bind(env, a.number, cap);
+    }
+    return env;
+}
+
+// ---- Passes
+
+// What the edges bring; the block has been reached. A loop that does not change a variable cannot make its set grow.
+vpenv VALUE_SETS::merged(const BLOCK_STATE& b) const {
+    std::vector<vpenv> ahead, from;
+    const int number = number_of[b.bb];
+    for (size_t e : b.in)
+        if (edges[e].is_passed) {
+            from.push_back(edges[e].env);
+            if (edges[e].from < number) ahead.push_back(edges[e].env);
+        }
+    if (!b.heads_loop || ahead.empty() || ahead.size() == from.size()) return vpenv_store->join(std::move(from));
+    const vpenv entered = vpenv_store->join(std::move(ahead)), all = vpenv_store->join(std::move(from));
+    vpenv env = all;
+    vpenv_store->for_each_difference(entered, all, [&](int symbol, const vpset* set, const vpset*) {
+        if (std::binary_search(b.altered.begin(), b.altered.end(), symbol)) return;
+        if (b.alters_globals && !vpenv_store->symbol(symbol)->is_automatic()) return;
+        env = vpenv_store->bind(env, symbol, set ? *set : vpset());
+    });
+    return env;
+}
+
+// Whether the block is to be evaluated: its entry is another than before.
+bool VALUE_SETS::enter(BLOCK_STATE& b, int pass) {
+    const bool is_first = &b == &blocks.front();
+    if (!is_first && std::none_of(b.in.begin(), b.in.end(), [this](size_t e) { return edges[e].is_passed; })) return false;
+    vpenv merged = is_first ? vpenv() : this->merged(b);
+    if (!b.capped.empty()) merged = capped(b, merged);
+    if (b.is_reached && b.closes_cycle) {
+        const vpenv before = merged;
+        vpenv_store->for_each_difference(b.entry, before, [&](int number, const vpset* old, const vpset* now) {
+            if (!now) return;
+            if (old)
+                merged = vpenv_store->bind(merged, number, widened(*old, *now, vpenv_store->symbol(number)->type, b.thresholds, pass));
+            else if (pass >= FIRST_WITHOUT_NARROWING)
+                merged = vpenv_store->bind(merged, number, vpset());
+        });
+    }
+    bool is_same = b.is_reached;
+    if (is_same)
+        vpenv_store->for_each_difference(b.entry, merged, [&](int, const vpset* x, const vpset* y) {
+            is_same = is_same && x && y && vpset_equal(*x, *y);
+        });
+    b.is_reached = true;
+    if (!is_same) b.entry = merged;
+    return !is_same;
+}
+
+void VALUE_SETS::leave_by(size_t edge, vpenv env, bool can_be) {
+    EDGE_STATE& e = edges[edge];
+    bool is_same = e.is_passed == can_be;
+    if (is_same && can_be)
+        vpenv_store->for_each_difference(e.env, env, [&](int, const vpset* x, const vpset* y) {
+            is_same = is_same && x && y && vpset_equal(*x, *y);
+        });
+    if (is_same) return;
+    e.env = env;
+    e.is_passed = can_be;
+    at(e.to).is_due = is_changed = true;
+}
+
+void VALUE_SETS::leave(BLOCK_STATE& b) {
+    const NODE* control = b.bb->branch();
+    const bool tests = control && control->op == IF && b.out.size() == 2;
+    const bool selects = control && control->op == SWITCH && !tree_is_EH_SWITCH(control) && b.out.size() >= 2 &&
+                         has_vpset(control->left->type);
+    if (!tests && !selects) {
+        for (size_t e : b.out) leave_by(e, b.exit, true);
+        return;
+    }
+    if (tests) {
+        const BBLK* on_true = control->right->left->lbl->bblock;
+        for (size_t e : b.out) {
+            vpenv env = b.exit;
+            const bool can_be = filter_vpenv(&env, control->left, at(edges[e].to).bb == on_true);
+            leave_by(e, env, can_be);
+        }
+        return;
+    }
+    const CASES cases(control);
+    for (size_t e : b.out) {
+        const BBLK* to = at(edges[e].to).bb;
+        vpenv env = b.exit;
+        bool can_be = true;
+        if (to == cases.otherwise)
+            can_be = cases.without_listed(&env, control->left, to);
+        else if (const vpset values = cases.of(to); !vpset_is_empty(values))
+            can_be = filter_vpenv_by_values(&env, control->left, values);
+        leave_by(e, env, can_be);
+    }
+}
+
+void VALUE_SETS::evaluate(BLOCK_STATE& b, int pass) {
+    b.is_due = false;
+    if (!enter(b, pass)) return;
+    vpenv_store->begin_exclusive();
+    vpenv env = b.entry;
+    for (const VP_EFFECT& effect : b.effects) {
+        if (!b.updated.empty()) update_amounts(b, effect, effect.during(env), pass);
+        env = effect.behind(env, true);
+    }
+    b.exit = env;
+    leave(b);
+}
+
+// Of nested loops the inner ones come to rest first: where a block has changed the entry of one at or ahead of it, that
+// one is next, a bounded number of times.
+bool VALUE_SETS::run_pass(int pass) {
+    is_changed = false;
+    for (BLOCK_STATE& b : blocks) b.returns = 0;
+    for (size_t i = 0; i < blocks.size(); ++i) {
+        if (!blocks[i].is_due) continue;
+        evaluate(blocks[i], pass);
+        size_t head = i + 1;
+        for (size_t e : blocks[i].out) {
+            const size_t to = static_cast<size_t>(edges[e].to);
+            if (to <= i && at(edges[e].to).is_due) head = std::min(head, to);
+        }
+        if (head > i || returns_left <= 0 || ++blocks[head].returns > MOST_RETURNS) continue;
+        returns_left -= static_cast<long>(i - head + 1);
+        i = head - 1;
+    }
+    return is_changed;
+}
+
+bool VALUE_SETS::find(bool with_loops) {
+    find_tracked_symbols();
+    read_graph();
+    find_altered();
+    if (with_loops) find_accumulators();
+    blocks.front().is_due = true;
+    returns_left = static_cast<long>(blocks.size()) * BLOCKS_OF_RETURNS;
+    int pass = 1;
+    while (run_pass(pass) && pass < MOST_PASSES) ++pass;
+    if (print_debug) debug_printf("%7d iterations completed.\n", pass);
+    return !is_changed;
+}
+
+std::unique_ptr<VALUE_SETS> sets;
+
+} // namespace
+
+void construct_vpsets_for_cfg(int noLoops) {
+    need(fact::block_numbers | fact::loops | fact::alias_marks);
+    sets = std::make_unique<VALUE_SETS>();
+    if (sets->find(!noLoops)) return;
+    if (print_debug) debug_printf("\t*** Failed to find VP fixpoint!\n");
+    deconstruct_vpsets_for_cfg();
+}
+
+void deconstruct_vpsets_for_cfg() {
+    sets.reset();
+    erase_all_vpenvs();
+}
+
+const vpenv* bb_vpenv(const BBLK* bb, bool at_exit) { return sets ? sets->of(bb, at_exit) : nullptr; }

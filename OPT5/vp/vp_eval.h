@@ -1,0 +1,61 @@
+// Sets of trees in an environment. For this room.
+#pragma once
+
+#include "OPT5/vp/vpenv.h"
+
+struct LOOP;
+
+// What is tracked and evaluated: an integer, enumeration or pointer whose values have a range.
+bool has_vpset(const TYPE* type);
+
+// The set of the tree's value, never without a slice for such a type; of another type it has none. With `assign` the
+// environment behind the evaluation is returned, as it is behind a statement; otherwise that ahead of it.
+vpenv eval_expr_in_vpenv(vpset* out, const NODE* tree, struct LOOP* loop, vpenv env, int assign);
+vpset vpset_of_tree(const NODE* tree, vpenv env);
+// What holds besides where the condition has come out so; it is evaluated in `env`. False: it cannot come out so.
+bool filter_vpenv(vpenv* env, const NODE* condition, bool holds);
+// The selector of a SWITCH has one of the values.
+bool filter_vpenv_by_values(vpenv* env, const NODE* selector, const vpset& values);
+
+// What a statement does to the environment.
+class VP_EFFECT {
+public:
+    explicit VP_EFFECT(const NODE* statement);
+    bool is_none() const { return target < 0 && lost.empty() && !asserted && !loses_globals; }
+    // `exclusive`: the environment is changed in place.
+    vpenv behind(vpenv env, bool exclusive) const;
+    // What the parts of the statement may rely on while it is evaluated: nothing that it writes on the way.
+    vpenv during(vpenv env) const;
+    const std::vector<int>& lost_symbols() const { return lost; }
+    int assigned_symbol() const { return target; } // -1 without
+    bool may_lose_globals() const { return loses_globals; }
+    const NODE* statement() const { return tree; }
+
+private:
+    vpset value(vpenv env) const;
+
+    const NODE* tree;
+    const NODE* asserted = nullptr; // a condition that holds from here on
+    int target = -1;                // the symbol that the statement's root assigns
+    std::vector<int> lost;          // symbols that are written besides
+    bool loses_globals = false;
+};
+
+// While it lives, bounds of trees take in what the environment says.
+class VALUES_AT : VARIABLE_VALUES {
+public:
+    explicit VALUES_AT(const vpenv* at) : env(at), outer(values_of_variables) { values_of_variables = this; }
+    ~VALUES_AT() override { values_of_variables = outer; }
+    VALUES_AT(const VALUES_AT&) = delete;
+    VALUES_AT& operator=(const VALUES_AT&) = delete;
+    bool bounds_of_variable(const SYMTAB* sym, INT65* min, INT65* max) const override;
+
+private:
+    const vpenv* env;
+    const VARIABLE_VALUES* outer;
+};
+
+// ---- vp_builtins.cpp
+// The evaluator of a built-in, or null: it has the arguments of `eval_expr_in_vpenv`.
+using VPSET_EVALUATOR = vpenv (*)(vpset* out, const NODE* call, struct LOOP* loop, vpenv env, int assign);
+VPSET_EVALUATOR vpset_evaluator_of(const NODE* call);

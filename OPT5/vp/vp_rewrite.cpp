@@ -1,0 +1,424 @@
+// What value sets settle: names of one value, tests, divisions, and facts of loops.
+//
+// A tree is rewritten by the environment that holds while it is evaluated. Most rules are the simplifier's own: it asks
+// for bounds, and bounds take in the environment. What it cannot see, holes and steps of a set, and remainders that a
+// compare can tell, is done here.
+//
+// Needs: alias marks; in a loop hierarchy trip counts and invariants. Leaves: blocks and edges; the hierarchy, whose
+// control variables and their tests are left as it knows them.
+// Sound because the environment holds wherever the tree is evaluated, and each rewrite gives the same value for every
+// member of its operands' sets. A rewritten tree stands where it stood; a pass that evaluates it elsewhere uses the value
+// only where it would have been used before.
+#include "OPT5/vp/vp.h"
+
+#include "OPT5/alias/effects.h"
+#include "OPT5/dd/loop.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
+#include "OPT5/ir/type_ops.h"
+#include "OPT5/simp/exact.h"
+#include "OPT5/simp/simp.h"
+#include "OPT5/target/bif.h"
+
+#include <memory>
+
+bool vp_changed = false;
+
+namespace {
+
+register_option pass_debug_vp_asserts("debug:vp_asserts"); // each binding at the entry of a block becomes an assertion
+
+bool is_integer(const TYPE* t) { return has_value_range(t) && !t->is_enum() && !t->is_bool(); }
+
+// A part whose operands are not values: what it says would change with them.
+bool is_left_alone(const NODE* t) {
+    switch (t->op) {
+    case LOOP:
+    case INITLOOP:
+    case ENDLOOP:
+    case PPRAGMA:
+    case ASM:
+    case NASSERT:
+    case ASSERT:
+    case MCALL:
+    case UMCALL:
+    case UICALL: return true;
+    case ICALL: {
+        const BIF* bif = find_BIF_descriptor(t->u.name);
+        return bif && bif->has(MUST_NOT_CSE | OPDS_MUST_NOT_CSE);
+    }
+    default: return false;
+    }
+}
+
+// An operator that the simplifier does more with where it knows bounds.
+bool depends_on_bounds(int op) {
+    switch (op) {
+    case ABS:
+    case DIV:
+    case MOD:
+    case SRL:
+    case ANDB:
+    case ORB:
+    case XORB:
+    case ICALL: return true;
+    default: return op_is_int_compare(op);
+    }
+}
+
+class REWRITER {
+public:
+    explicit REWRITER(vpenv in, const SYMTAB* without) : env(in), kept(without), source(&env) {}
+
+    NODE* rewritten(NODE* t, bool lvalue) {
+        if (!t || is_left_alone(t)) return t;
+        const bool outer_informed = informed, outer_changed = changed;
+        informed = changed = false;
+        t = t->op == NAME ? name(t, lvalue) : node(t, lvalue);
+        any |= changed;
+        informed |= outer_informed;
+        changed |= outer_changed;
+        return t;
+    }
+
+    bool any = false;
+
+private:
+    NODE* name(NODE* t, bool lvalue) {
+        const int number = lvalue || !t->u.sym ? -1 : vpenv_store->number_of(t->u.sym);
+        const vpset* known = number < 0 ? nullptr : vpenv_store->find(env, number);
+        if (!known) return t;
+        informed = true;
+        if (!vpset_is_single(*known) || !is_integer(t->type) || t->u.sym == kept || t->type->size != t->u.sym->type->size ||
+            is_optimizer_temp(t->u.sym->name, 'K', 'Q'))
+            return t;
+        NODE* value = mk_ICON(to_int65(vpset_minimum(*known)), t->type->stqs());
+        erase_node(t);
+        changed = true;
+        return value;
+    }
+
+    NODE* node(NODE* t, bool lvalue) {
+        operands(t, lvalue);
+        if (lvalue || !informed) return t;
+        if (t->op == IF) t->left = decided(t->left);
+        if (op_transfers_control(t->op)) return t;
+        if (changed) return simp_node(t, nullptr);
+        if (op_is_int_compare(t->op) || (t->op == QUEST && t->right->op == COLON)) t = decided(t);
+        if (t->op == MOD && is_integer(t->type)) t = remainder(t);
+        if (t->op == ICALL || t->op == QUEST) t = sum_of_alternatives(t);
+        if (!depends_on_bounds(t->op)) return t;
+        const int op = t->op;
+        t = simp_node(t, nullptr);
+        changed |= t->op != op;
+        return t;
+    }
+
+    void operands(NODE* t, bool lvalue) {
+        switch (t->op) {
+        case QUEST:
+        case ANDAND:
+        case OROR: return conditional(t);
+        case UAND:
+        case ARGREF:
+            t->left = rewritten(t->left, true);
+            return;
+        case STDOT:
+            t->left = rewritten(t->left, lvalue);
+            return;
+        default:
+            t->right = rewritten(t->right, false);
+            t->left = rewritten(t->left, writes_left_operand(t->op));
+        }
+    }
+
+    // Operands behind a condition are evaluated where it came out in one sense.
+    void conditional(NODE* t) {
+        t->left = rewritten(t->left, false);
+        const vpenv outer = env;
+        auto under = [&](NODE* arm, bool holds) {
+            if (filter_vpenv(&env, t->left, holds)) arm = rewritten(arm, false);
+            env = outer;
+            return arm;
+        };
+        if (t->op != QUEST)
+            t->right = under(t->right, t->op == ANDAND);
+        else if (t->right->op == COLON) {
+            t->right->left = under(t->right->left, true);
+            t->right->right = under(t->right->right, false);
+        }
+    }
+
+    // A test that always comes out the same, and a choice by one.
+    NODE* decided(NODE* t) {
+        NODE* test = t->op == QUEST ? t->left : t;
+        if (!has_vpset(test->type)) return t;
+        const vpset s = vpset_of_tree(test, env);
+        if (vpset_is_empty(s) || !test->type->is_int() || (s.holds(0) && !vpset_is_single(s))) return t;
+        const bool holds = !s.holds(0);
+        if (test->op == ICON) return t;
+        NODE* constant = mk_COMMAOP(peel_for_effect(test), mk_ICON(INT65(holds ? 1 : 0), tp->int_t));
+        changed = true;
+        if (t == test) return constant;
+        t->left = constant;
+        return simp_node(t, nullptr);
+    }
+
+    // x % d, where x is not negative and d is above 0.
+    NODE* remainder(NODE* t) {
+        const vpset a = vpset_of_tree(t->left, env), d = vpset_of_tree(t->right, env);
+        if (vpset_is_empty(a) || vpset_is_empty(d) || vpset_minimum(d) <= 0 || vpset_minimum(a) < 0) return t;
+        if (vpset_maximum(a) < vpset_minimum(d) && !tree_has_side_effects(t->right)) {
+            changed = true;
+            NODE* x = t->left;
+            TYPE* type = t->type;
+            erase_tree(t->right);
+            erase_node(t);
+            return coerce_to_type(type->stqs(), x);
+        }
+        if (t->right->op != ICON && t->left->type->size == t->right->type->size &&
+            positive_tree_is_power_of_2(t->right, nullptr)) {
+            changed = true;
+            t->op = ANDB;
+            TYPE* type = t->right->type->stqs();
+            t->right = made_exact(PLUS, t->right, mk_ICON(INT65(-1), type), type, nullptr);
+            return simp_node(t, nullptr);
+        }
+        return vpset_is_single(d) ? stepped_remainder(t, vpset_minimum(d)) : t;
+    }
+
+    // (x + c) % d, where that is x + c or one turn less.
+    NODE* stepped_remainder(NODE* t, WIDE d) {
+        NODE *sum = t->left, *x = sum->left;
+        if (sum->op != PLUS || sum->right->op != ICON || x->op != NAME || !is_integer(sum->type) ||
+            sum->type->size != t->type->size || x->type->size != sum->type->size || power_of_2(to_int65(d)) >= 0)
+            return t;
+        const WIDE c = to_wide(truncate_to_type(sum->right->u.lval, sum->type->stqs()));
+        const vpset xs = vpset_of_tree(x, env);
+        if (c < 0 || vpset_is_empty(xs) || vpset_minimum(xs) < 0 || vpset_maximum(xs) + c >= 2 * d ||
+            vpset_maximum(xs) + c > range_of_type(sum->type).max)
+            return t;
+        changed = true;
+        TYPE* type = t->type->stqs();
+        const WIDE limit = d - 1 - c; // x above it: a turn less
+        if (limit < 0) { // always
+            NODE* less = made_exact(PLUS, copy_tree(x), mk_ICON(to_int65(c - d), x->type->stqs()), x->type->stqs(), nullptr);
+            erase_tree(t);
+            return coerce_to_type(type, less);
+        }
+        NODE* test = maketree(is_signed(x->type) ? GT : UGT, copy_tree(x), mk_ICON(to_int65(limit), x->type->stqs()), tp->int_t);
+        NODE* less = made_exact(PLUS, copy_tree(x), mk_ICON(to_int65(c - d), x->type->stqs()), x->type->stqs(), nullptr);
+        NODE* choice = maketree(QUEST, simp_node(test, nullptr),
+                                maketree(COLON, coerce_to_type(type, less), coerce_to_type(type, copy_tree(sum)), type), type);
+        erase_tree(t);
+        return simp_node(choice, nullptr);
+    }
+    static bool is_signed(const TYPE* t) { return wraps_signed(t); }
+
+    // (x == k) ? a : k, where x is k or a: k + a - x.
+    NODE* sum_of_alternatives(NODE* t) {
+        const bool is_strict = t->op == ICALL && is_strict_ternary_ICALL(t);
+        if (!is_strict && !(t->op == QUEST && t->right->op == COLON)) return t;
+        NODE* test = is_strict ? arg_list_lookup(t->left, 0) : t->left;
+        NODE* on_true = is_strict ? arg_list_lookup(t->left, 1) : t->right->left;
+        NODE* on_false = is_strict ? arg_list_lookup(t->left, 2) : t->right->right;
+        if (test->op == NEQ) std::swap(on_true, on_false);
+        if ((test->op != EQ && test->op != NEQ) || test->right->op != ICON || on_true->op != ICON || on_false->op != ICON ||
+            tree_has_side_effects(test) || !is_integer(test->left->type) || !is_integer(t->type) ||
+            test->left->type->size != t->type->size || is_signed(test->left->type) != is_signed(t->type))
+            return t;
+        auto value = [](const NODE* c, const TYPE* type) {
+            vpset s(single_slice(to_wide(c->u.lval)));
+            truncate_vpset_to_type(&s, type);
+            return vpset_minimum(s);
+        };
+        const TYPE* type = t->type;
+        const WIDE k = value(test->right, type), a = value(on_true, type);
+        const vpset xs = vpset_of_tree(test->left, env);
+        if (value(on_false, type) != k || a == k || vpset_size(xs) != 2 || !xs.holds(a) || !xs.holds(k)) return t;
+        const RANGE limits = range_of_type(type);
+        if (k + a < limits.min || k + a > limits.max) return t;
+        changed = true;
+        TYPE* plain = t->type->stqs();
+        NODE* x = coerce_to_type(plain, copy_tree(test->left));
+        erase_tree(t);
+        return made_exact(MINUS, mk_ICON(to_int65(k + a), plain), x, plain, nullptr);
+    }
+
+    vpenv env;
+    const SYMTAB* const kept;
+    VALUES_AT source;
+    bool informed = false; // something is known of a part of the tree in work
+    bool changed = false;  // a part of it has changed
+};
+
+NODE* comparison(int op, SYMTAB* sym, WIDE value) {
+    TYPE* type = sym->type->stqs();
+    return maketree(op, mk_NAME(sym), mk_ICON(to_int65(value), type), tp->int_t);
+}
+
+constexpr size_t MOST_FACTS = 12; // of values, for one loop
+
+void add_facts(struct LOOP* loop, vpenv env) {
+    size_t left = MOST_FACTS;
+    for (SYMTAB* sym : std::vector<SYMTAB*>(loop->RC_syms.begin(), loop->RC_syms.end())) {
+        const int number = vpenv_store->number_of(sym);
+        const vpset* known = number < 0 ? nullptr : vpenv_store->find(env, number);
+        if (!known || !sym_is_RC_in_loop(sym, loop)) continue;
+        for (NODE* predicate : list_VP_predicate_trees(*known, nullptr, sym))
+            if (left) {
+                --left;
+                add_loop_body_assertion(predicate, loop);
+            } else
+                erase_tree(predicate);
+        if (vpset_is_single(*known) && is_integer(sym->type) && loop->trips && loop->trips->op != ICON) {
+            NODE* name = mk_NAME(sym);
+            loop->trips = simp_subst_icon(to_int65(vpset_minimum(*known)), sym->type->stqs(), name, loop->trips);
+            erase_tree(name);
+        }
+    }
+    if (!loop->trips) return;
+    const VALUES_AT values(&env);
+    characterize_trip_count(loop);
+}
+
+// Where a loop's control variable is tested or updated, the hierarchy has the statement in mind.
+const SYMTAB* symbol_kept_in(const NODE* statement, const BBLK* bb) {
+    if (!bb->loop || bb->loop->is_root()) return nullptr;
+    INDUCTION_UPDATE update;
+    return is_induction_update(statement, &update) ? update.sym : nullptr;
+}
+bool is_left_to_hierarchy(const NODE* statement, const BBLK* bb) {
+    return bb->loop && !bb->loop->is_root() && (statement->op == IF || statement->op == SWITCH) &&
+           (bb == bb->loop->tail || bb == bb->loop->head);
+}
+
+void rewrite_block(BBLK* bb, vpenv env) {
+    for (LIST* s = bb->statements; s; s = s->rest) {
+        NODE* t = s->first;
+        const VP_EFFECT effect(t);
+        const vpenv behind = effect.behind(env, false);
+        if (!tree_is_arg_prolog(t) && !tree_is_EH_SWITCH(t) && !is_left_to_hierarchy(t, bb) && env != vpenv()) {
+            REWRITER work(effect.during(env), symbol_kept_in(t, bb));
+            s->first = work.rewritten(t, false);
+            vp_changed |= work.any;
+        }
+        env = behind;
+    }
+}
+
+// ---- Assertions for a check
+
+// One of the slices holds the symbol's value.
+NODE* membership(const vpset& set, SYMTAB* sym) {
+    NODE* any = nullptr;
+    const bool wraps = !wraps_signed(sym->type);
+    for (const VPSLICE& s : set) {
+        NODE* in = comparison(wraps ? UGE : GE, sym, s.low);
+        in = maketree(ANDAND, in, comparison(wraps ? ULE : LE, sym, s.high), tp->int_t);
+        if (s.step > 1 && s.step < static_cast<WIDE>(1) << (sym->type->size - 1)) {
+            TYPE* type = tp->mk_unsigned(sym->type->stqs());
+            NODE* distance = maketree(MINUS, coerce_to_type(type, mk_NAME(sym)), mk_ICON(to_int65(s.low), type), type);
+            NODE* rest = maketree(MOD, distance, mk_ICON(to_int65(s.step), type), type);
+            in = maketree(ANDAND, in, maketree(EQ, rest, mk_ICON(INT65(0), type), tp->int_t), tp->int_t);
+        }
+        any = any ? maketree(OROR, any, in, tp->int_t) : in;
+    }
+    return any;
+}
+
+void assert_bindings(BBLK* bb, vpenv env) {
+    vpenv_store->for_each_binding(env, [&](int number, const vpset& set) {
+        SYMTAB* sym = vpenv_store->symbol(number);
+        if (!is_integer(sym->type)) return;
+        insert_before(&bb->statements, maketree(NASSERT, membership(set, sym), nullptr, tp->int_t), nullptr);
+        currfuninfo->has_nasserts = true;
+    });
+}
+
+} // namespace
+
+std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extra, SYMTAB* sym) {
+    constexpr WIDE MANY = 1000, NEAR = 42;
+    VPSLICE hull;
+    vpset all = set;
+    if (extra) vpset_union(&all, set, vpset(*extra));
+    vpset_compress(&hull, all);
+    if (hull.is_empty() || !is_integer(sym->type)) return {};
+    if (vpslice_is_single(hull)) return {comparison(EQ, sym, hull.low)};
+    const RANGE limits = range_of_type(sym->type);
+    const bool is_unsigned = !wraps_signed(sym->type), has_many = vpslice_size(hull) >= MANY;
+    std::vector<NODE*> trees;
+    if (hull.low > limits.min && !(has_many && hull.low - limits.min <= NEAR))
+        trees.push_back(comparison(is_unsigned ? UGE : GE, sym, hull.low));
+    if (hull.high < limits.max && !(has_many && limits.max - hull.high <= NEAR))
+        trees.push_back(comparison(is_unsigned ? ULE : LE, sym, hull.high));
+    // The remainder of a negative number is negative.
+    if (hull.step >= 2 && hull.step <= limits.max && (hull.low >= 0 || hull.low % hull.step == 0)) {
+        TYPE* type = sym->type->stqs();
+        NODE* rest = maketree(MOD, mk_NAME(sym), mk_ICON(to_int65(hull.step), type), type);
+        trees.push_back(maketree(EQ, rest, mk_ICON(to_int65(hull.low % hull.step), type), tp->int_t));
+    }
+    return trees;
+}
+
+NODE* prop_values_in_tree(NODE* tree, vpenv env, bool lvalue, BBLK* bb) {
+    REWRITER work(env, symbol_kept_in(tree, bb));
+    NODE* t = work.rewritten(tree, lvalue);
+    vp_changed |= work.any;
+    return t;
+}
+
+void do_value_propagation() {
+    if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'Value Propagation' ----------\n");
+    vp_changed = false;
+    struct LOOP* const root = loop_root();
+    construct_vpsets_for_cfg(root == nullptr);
+    for (BBLK* bb = currfuninfo->bb_list; bb && vpenv_store; bb = bb->dflink) {
+        const vpenv* entry = bb_vpenv(bb, false);
+        if (!entry) continue;
+        if (print_debug > 1) dump_vpenv(*entry, bb->str());
+        if (root && bb->loop && !bb->loop->is_root() && bb->loop->head == bb) add_facts(bb->loop, *entry);
+        rewrite_block(bb, *entry);
+        if (pass_debug_vp_asserts) assert_bindings(bb, *entry);
+    }
+    deconstruct_vpsets_for_cfg();
+}
+
+// ---- For rooms below
+
+namespace {
+
+const BBLK* walked = nullptr;
+vpenv ahead, behind;
+std::unique_ptr<VALUES_AT> walk_values;
+
+void begin_walk() {
+    walked = nullptr;
+    construct_vpsets_for_cfg(1);
+}
+void walk_to(const BBLK* bb, const NODE* statement) {
+    if (!vpenv_store) return;
+    if (bb != walked) {
+        const vpenv* entry = bb_vpenv(bb, false);
+        behind = entry ? *entry : vpenv();
+        walked = bb;
+    }
+    const VP_EFFECT effect(statement);
+    ahead = effect.during(behind);
+    behind = effect.behind(behind, false);
+    if (print_debug > 1) dump_vpenv(ahead, tree_to_infix(statement).c_str());
+    if (!walk_values) walk_values = std::make_unique<VALUES_AT>(&ahead);
+}
+void end_walk() {
+    walk_values.reset();
+    deconstruct_vpsets_for_cfg();
+}
+
+} // namespace
+
+void install_value_propagation() {
+    loop_work.propagate_values = do_value_propagation;
+    value_walk = {begin_walk, walk_to, end_walk};
+}

@@ -133,7 +133,10 @@ struct CASES {
     vpset of(const BBLK* bb) const {
         auto it = values.find(bb);
         if (it == values.end()) return {};
-        if (it->second.size() <= MOST_LISTED_CASES) return vpset_of(it->second);
+        VPSLICE_LIST list;
+        for (const VPSLICE& s : it->second)
+            if (it->second.size() <= MOST_LISTED_CASES) list.push_back(s);
+        if (list.size()) return vpset_of(list);
         WIDE low = it->second[0].low, high = low;
         for (const VPSLICE& s : it->second) low = std::min(low, s.low), high = std::max(high, s.low);
         return vpset(make_vpslice(low, high, 1));

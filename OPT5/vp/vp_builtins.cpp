@@ -22,7 +22,8 @@ vpset saturated(const vpset& s, const TYPE* type) {
     const RANGE limits = vpset_limits(type);
     vpset inside;
     if (!vpset_within(&inside, s, limits.min, limits.max)) make_vpset_empty(&inside);
-    std::vector<VPSLICE> list(inside.begin(), inside.end());
+    VPSLICE_LIST list;
+    for (const VPSLICE& slice : inside) list.push_back(slice);
     if (vpset_minimum(s) < limits.min) list.push_back(single_slice(limits.min));
     if (vpset_maximum(s) > limits.max) list.push_back(single_slice(limits.max));
     return vpset_of(list);

@@ -270,7 +270,7 @@ private:
     vpset on_bits(const NODE* t, const vpset& a, const vpset& b) {
         auto is_listed = [](const vpset& s) { return vpset_size(s) == s.size(); };
         if (is_listed(a) && is_listed(b)) {
-            std::vector<VPSLICE> list;
+            VPSLICE_LIST list;
             for (const VPSLICE& x : a)
                 for (const VPSLICE& y : b)
                     list.push_back(single_slice(t->op == ANDB  ? x.low & y.low

@@ -103,29 +103,6 @@ VPSLICE common(const VPSLICE& a, const VPSLICE& b) {
     return slice_between(low, high, {meets, meets + lcm, lcm});
 }
 
-void merge(std::vector<VPSLICE>& list) {
-    std::sort(list.begin(), list.end(), is_before);
-    while (list.size() > 1) {
-        size_t at = 0, with = 1;
-        WIDE least = -1;
-        for (size_t i = 0; i < list.size() && least != 0; ++i)
-            for (size_t j = i + 1; j < list.size(); ++j) {
-                const VPSLICE both = hull_of(list[i], list[j]);
-                const bool contains = both == list[i] || both == list[j];
-                const WIDE cost = contains ? 0 : vpslice_size(both) - vpslice_size(list[i]) - vpslice_size(list[j]);
-                if (least >= 0 && cost >= least && !contains) continue;
-                least = std::max(cost, static_cast<WIDE>(0));
-                at = i;
-                with = j;
-                if (contains) break;
-            }
-        if (least > 0 && list.size() <= vpset::MOST_SLICES) return;
-        list[at] = hull_of(list[at], list[with]);
-        list.erase(list.begin() + static_cast<std::ptrdiff_t>(with));
-        std::sort(list.begin(), list.end(), is_before);
-    }
-}
-
 std::string text_of(WIDE v) {
     if (v < 0) return "-" + text_of(-v);
     std::string digits;
@@ -137,6 +114,39 @@ std::string text_of(WIDE v) {
 } // namespace
 
 // ---- Slices
+
+void VPSLICE_LIST::push_back(const VPSLICE& s) {
+    if (s.is_empty()) return;
+    if (count == MOST) merge(vpset::MOST_SLICES);
+    slices[count++] = s;
+}
+void VPSLICE_LIST::erase(int i) {
+    std::copy(slices + i + 1, slices + count, slices + i);
+    --count;
+}
+void VPSLICE_LIST::sort() {
+    if (count > 1) std::sort(slices, slices + count, is_before);
+}
+
+void VPSLICE_LIST::merge(int most) {
+    for (sort(); count > 1; sort()) {
+        int at = 0, with = 1;
+        WIDE least = -1;
+        for (int i = 0; i < count && least != 0; ++i)
+            for (int j = i + 1; j < count && least != 0; ++j) {
+                const VPSLICE both = hull_of(slices[i], slices[j]);
+                const bool contains = both == slices[i] || both == slices[j];
+                const WIDE cost = contains ? 0 : vpslice_size(both) - vpslice_size(slices[i]) - vpslice_size(slices[j]);
+                if (least >= 0 && cost >= least) continue;
+                least = std::max(cost, static_cast<WIDE>(0)); // overlapping slices count their members twice
+                at = i;
+                with = j;
+            }
+        if (least > 0 && count <= most) return;
+        slices[at] = hull_of(slices[at], slices[with]);
+        erase(with);
+    }
+}
 
 bool vpslice_is_single(const VPSLICE& s) { return s.low == s.high; }
 
@@ -221,21 +231,10 @@ std::string vpset2string(const vpset& s) {
     return text;
 }
 
-vpset vpset_of(std::vector<VPSLICE> list) {
-    list.erase(std::remove_if(list.begin(), list.end(), [](const VPSLICE& s) { return s.is_empty(); }), list.end());
-    // One that others cover says nothing.
-    std::sort(list.begin(), list.end(), is_before);
-    for (size_t i = 0; i < list.size();) {
-        bool is_covered = false;
-        for (size_t j = 0; j < list.size() && !is_covered; ++j) is_covered = j != i && lies_in(list[i], list[j]);
-        if (is_covered)
-            list.erase(list.begin() + static_cast<std::ptrdiff_t>(i));
-        else
-            ++i;
-    }
-    merge(list);
+vpset vpset_of(VPSLICE_LIST& list) {
+    if (list.size() > 1) list.merge(vpset::MOST_SLICES);
     vpset s;
-    for (const VPSLICE& slice : list) s.append(slice);
+    for (int i = 0; i < list.size(); ++i) s.append(list[i]);
     return s;
 }
 
@@ -248,10 +247,11 @@ void vpset_union(vpset* out, const vpset& a, const vpset& b) {
         *out = a;
         return;
     }
-    std::vector<VPSLICE> list(a.begin(), a.end());
+    VPSLICE_LIST list;
+    for (const VPSLICE& slice : a) list.push_back(slice);
     for (VPSLICE rest : b) {
         for (const VPSLICE& slice : a) vpslice_difference(&rest, rest, slice);
-        if (!rest.is_empty()) list.push_back(rest);
+        list.push_back(rest);
     }
     *out = vpset_of(list);
 }
@@ -261,7 +261,7 @@ bool vpset_intersection(vpset* out, const vpset& a, const vpset& b) {
         *out = vpset_is_empty(a) ? b : a;
         return true;
     }
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& x : a)
         for (const VPSLICE& y : b) list.push_back(common(x, y));
     *out = vpset_of(list);
@@ -269,7 +269,7 @@ bool vpset_intersection(vpset* out, const vpset& a, const vpset& b) {
 }
 
 bool vpset_without(vpset* out, const vpset& a, WIDE v) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& s : a) {
         if (!s.holds(v)) {
             list.push_back(s);
@@ -284,7 +284,7 @@ bool vpset_without(vpset* out, const vpset& a, WIDE v) {
 }
 
 bool vpset_within(vpset* out, const vpset& a, WIDE low, WIDE high) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& s : a) list.push_back(slice_between(std::max(low, s.low), std::min(high, s.high), s));
     *out = vpset_of(list);
     return !vpset_is_empty(*out);
@@ -316,7 +316,7 @@ bool vpset_is_bottom(const vpset& s, const TYPE* type) {
 
 namespace {
 
-void truncate_slice(const VPSLICE& s, const RANGE& limits, WIDE turn, std::vector<VPSLICE>* list) {
+void truncate_slice(const VPSLICE& s, const RANGE& limits, WIDE turn, VPSLICE_LIST* list) {
     if (limits.min <= s.low && s.high <= limits.max) return list->push_back(s);
     if (s.high - s.low >= turn) { // what the powers of two in the step keep apart stays apart
         WIDE grid = 1;
@@ -339,7 +339,7 @@ void truncate_vpset_to_type(vpset* s, const TYPE* type) {
     const RANGE limits = vpset_limits(type);
     if (limits.min <= vpset_minimum(*s) && vpset_maximum(*s) <= limits.max) return;
     if (type->is_enum()) return make_vpset_bottom(s, type);
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     if (type->is_bool()) {
         vpset rest;
         if (s->holds(0)) list.push_back(single_slice(0));
@@ -353,7 +353,7 @@ void include_incr_in_vpset(WIDE incr, vpset* s, const TYPE* type) {
     if (incr == 0) return;
     const RANGE limits = vpset_limits(type);
     const bool wraps = !type->is_pointer() && !wraps_signed(type);
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& slice : *s) {
         const WIDE step = gcd(slice.step, incr);
         const VPSLICE grid{slice.low, slice.low + step, step};
@@ -397,7 +397,7 @@ void by_sign(const vpset& a, const F& visit) {
 } // namespace
 
 bool vpset_sum(vpset* out, const vpset& a, const vpset& b) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& x : a)
         for (const VPSLICE& y : b) list.push_back(on_grid(x.low + y.low, x.high + y.high, gcd(x.step, y.step)));
     *out = vpset_of(list);
@@ -405,14 +405,14 @@ bool vpset_sum(vpset* out, const vpset& a, const vpset& b) {
 }
 
 bool vpset_negative(vpset* out, const vpset& a) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& s : a) list.push_back(negative_of(s));
     *out = vpset_of(list);
     return true;
 }
 
 bool vpset_product(vpset* out, const vpset& a, const vpset& b) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& x : a)
         for (const VPSLICE& y : b) {
             VPSLICE p;
@@ -424,7 +424,7 @@ bool vpset_product(vpset* out, const vpset& a, const vpset& b) {
 }
 
 void vpset_quotient(vpset* out, const vpset& a, WIDE divisor) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     by_sign(a, [&](const VPSLICE& s, bool is_negative) {
         const bool divides = s.step % divisor == 0;
         const VPSLICE q = on_grid(s.low / divisor, s.high / divisor, divides && s.step ? s.step / divisor : 1);
@@ -435,7 +435,7 @@ void vpset_quotient(vpset* out, const vpset& a, WIDE divisor) {
 
 void vpset_shifted_down(vpset* out, const vpset& a, int count) {
     const WIDE by = static_cast<WIDE>(1) << count;
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     for (const VPSLICE& s : a) {
         const bool divides = s.step % by == 0;
         list.push_back(on_grid(floor_div(s.low, by), floor_div(s.high, by), divides && s.step ? s.step / by : 1));
@@ -444,7 +444,7 @@ void vpset_shifted_down(vpset* out, const vpset& a, int count) {
 }
 
 void vpset_remainder(vpset* out, const vpset& a, WIDE divisor) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     by_sign(a, [&](const VPSLICE& s, bool is_negative) {
         VPSLICE r = s;
         if (s.high / divisor == s.low / divisor)
@@ -459,7 +459,7 @@ void vpset_remainder(vpset* out, const vpset& a, WIDE divisor) {
 }
 
 void vpset_absolute(vpset* out, const vpset& a) {
-    std::vector<VPSLICE> list;
+    VPSLICE_LIST list;
     by_sign(a, [&](const VPSLICE& s, bool) { list.push_back(s); });
     *out = vpset_of(list);
 }

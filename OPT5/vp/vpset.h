@@ -7,7 +7,6 @@
 #include "OPT5/simp/range.h"
 
 #include <string>
-#include <vector>
 
 class TYPE;
 
@@ -20,6 +19,22 @@ struct VPSLICE {
         return low <= v && v <= high && (step == 0 || (v - low) % step == 0);
     }
     bool operator==(const VPSLICE& o) const { return low == o.low && high == o.high && step == o.step; }
+};
+
+// Slices on their way to a set.
+class VPSLICE_LIST {
+public:
+    static constexpr int MOST = 10; // one more merges those that are there
+    void push_back(const VPSLICE& s);
+    int size() const { return count; }
+    VPSLICE& operator[](int i) { return slices[i]; }
+    void erase(int i);
+    void sort();
+    void merge(int most); // until there are no more than `most`, and no two have a hull that adds nothing
+
+private:
+    VPSLICE slices[MOST];
+    int count = 0;
 };
 
 // Slices by their low ends. No slice: nothing is known, which is not "no value".
@@ -37,7 +52,7 @@ public:
     bool operator==(const vpset& o) const;
 
 private:
-    friend vpset vpset_of(std::vector<VPSLICE> list);
+    friend vpset vpset_of(VPSLICE_LIST& list);
     void append(const VPSLICE& s) {
         if (!s.is_empty()) slices[count++] = s;
     }
@@ -70,7 +85,7 @@ bool vpset_equal(const vpset& a, const vpset& b);
 bool vpset_is_subset(const vpset& a, const vpset& b); // true only if it is one
 std::string vpset2string(const vpset& s);
 // The slices, merged with their nearest neighbours until they are few enough.
-vpset vpset_of(std::vector<VPSLICE> list);
+vpset vpset_of(VPSLICE_LIST& list); // which is used up
 void vpset_union(vpset* out, const vpset& a, const vpset& b);
 // Null where they share no member; an operand of which nothing is known gives the other.
 bool vpset_intersection(vpset* out, const vpset& a, const vpset& b);

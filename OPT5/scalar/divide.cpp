@@ -276,6 +276,15 @@ bool contains_division(NODE* t) {
     return found;
 }
 
+bool bounds_of_dividend(const NODE* x, INT65* low, INT65* high) {
+    if (!calculate_bounds(x, nullptr, low, high)) return false;
+    INT65 least, most;
+    if (!low->is_negative() || !values_of_variables || !values_of_variables->bounds_of_tree(x, &least, &most)) return true;
+    if (*low < least) *low = least;
+    if (most < *high) *high = most;
+    return true;
+}
+
 NODE* without_divisions(NODE* t, bool* changed) {
     if (!t || is_left_alone(t)) return t;
     t = spelled_out(t);
@@ -306,7 +315,7 @@ bool find_reciprocal(uint64_t divisor, uint64_t limit, uint64_t product_limit, i
 NODE* warp_DIV_to_MULT(NODE* t) {
     TYPE* type = type_of_division(t);
     INT65 low, high;
-    if (!type || !calculate_bounds(t->left, nullptr, &low, &high) || (low.is_zero() && high.is_zero())) return t;
+    if (!type || !bounds_of_dividend(t->left, &low, &high) || (low.is_zero() && high.is_zero())) return t;
     const INT65 c = t->right->u.lval;
     const long cost = cost_of_sequence(t->op, c, type, low, high);
     if (cost < 0 || cost + cost_for_DIV_to_MULT_expr(t->left) >= cost_of_division(t)) return t;

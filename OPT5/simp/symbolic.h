@@ -35,6 +35,9 @@ class VARIABLE_VALUES {
 public:
     virtual ~VARIABLE_VALUES() = default;
     virtual bool bounds_of_variable(const SYMTAB* sym, INT65* min, INT65* max) const = 0; // false: its type's
+    // Of an integer tree that is evaluated here, whose signed sums and products are the numbers themselves, as a pass may
+    // conclude that puts another tree in its place.
+    virtual bool bounds_of_tree(const NODE* tree, INT65* min, INT65* max) const = 0;
 };
 extern const VARIABLE_VALUES* values_of_variables;
 // Who walks over the statements of the current function in order, and says so ahead of each before it changes it, has the

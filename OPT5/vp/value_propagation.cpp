@@ -194,7 +194,7 @@ struct ACCUMULATOR {
     size_t entered_by; // the edge
     const NODE* amount;
     bool is_subtracted;
-    WIDE most;     // updates between entries
+    WIDE most;     // updates between an entry and a later visit of the head
     vpset amounts; // of an update; empty: the statement was not reached yet
 };
 
@@ -303,15 +303,17 @@ void VALUE_SETS::add_accumulators(size_t block, const VP_EFFECT& effect) {
     const SYMTAB* sym = vpenv_store->symbol(number);
     INDUCTION_UPDATE update;
     if (!sym->is_automatic() || !has_value_range(sym->type) || sym->type->is_enum() || sym->type->is_bool()) return;
-    WIDE most = 1;
+    WIDE inside = 1; // updates of one iteration
     for (struct LOOP* l = blocks[block].bb->loop; l && !l->is_root(); l = l->parent) {
         if (writes[l][number] != 1 || !l->maxTrips || l->maxTrips->op != ICON || !l->preheader) return;
         if (!update.sym && (!is_induction_update(effect.statement(), &update) || update.sym != sym || !update.amount ||
                             update.is_narrowed || !has_value_range(update.amount->type)))
             return;
+        // A loop that is left ahead of its tail begins one more iteration than the tail ends.
         const WIDE trips = to_wide(l->maxTrips->u.lval) + (l->is_bottom_tested() ? 0 : 1);
-        if (trips <= 0 || trips > MOST_UPDATES || most > MOST_UPDATES / trips) return;
-        most *= trips;
+        if (trips <= 0 || trips > MOST_UPDATES || inside > MOST_UPDATES / trips) return;
+        const WIDE most = (trips - 1) * inside;
+        inside *= trips;
         BLOCK_STATE& head = at(number_of[l->head]);
         const int from = number_of[l->preheader];
         for (size_t e : head.in)
@@ -350,7 +352,6 @@ vpenv VALUE_SETS::capped(const BLOCK_STATE& b, vpenv env) const {
         if (!vpset_is_empty(a.amounts)) {
             const WIDE low = std::min(vpset_minimum(a.amounts), static_cast<WIDE>(0)) * a.most,
                        high = std::max(vpset_maximum(a.amounts), static_cast<WIDE>(0)) * a.most, step = vpset_gcd(a.amounts);
-            if (low == high) continue;
             vpset_sum(&sum, *on_entry, vpset(slice_between(low, high, {0, step, step})));
             if (limits.min > vpset_minimum(sum) || vpset_maximum(sum) > limits.max) {
                 // Only numbers that the type cannot hold are left out: of one that wraps there is no cap.

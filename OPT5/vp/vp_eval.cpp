@@ -482,6 +482,14 @@ bool VALUES_AT::bounds_of_variable(const SYMTAB* sym, INT65* min, INT65* max) co
     return true;
 }
 
+bool VALUES_AT::bounds_of_tree(const NODE* tree, INT65* min, INT65* max) const {
+    const vpset s = has_value_range(tree->type) ? vpset_of_tree(tree, *env) : vpset();
+    if (vpset_is_empty(s)) return false;
+    *min = to_int65(vpset_minimum(s));
+    *max = to_int65(vpset_maximum(s));
+    return true;
+}
+
 vpset vpset_of_tree(const NODE* tree, vpenv env) { return EVALUATION(env).of(tree); }
 
 vpenv eval_expr_in_vpenv(vpset* out, const NODE* tree, struct LOOP*, vpenv env, int assign) {

@@ -49,6 +49,7 @@ public:
     VALUES_AT(const VALUES_AT&) = delete;
     VALUES_AT& operator=(const VALUES_AT&) = delete;
     bool bounds_of_variable(const SYMTAB* sym, INT65* min, INT65* max) const override;
+    bool bounds_of_tree(const NODE* tree, INT65* min, INT65* max) const override;
 
 private:
     const vpenv* env;

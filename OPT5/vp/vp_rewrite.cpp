@@ -52,12 +52,11 @@ bool is_left_alone(const NODE* t) {
     }
 }
 
-// An operator that the simplifier does more with where it knows bounds.
+// An operator that the simplifier does more with where it knows bounds. Quotients by constants keep their shape, in
+// which others are equal to them, until they are taken apart for good.
 bool depends_on_bounds(int op) {
     switch (op) {
     case ABS:
-    case DIV:
-    case MOD:
     case SRL:
     case ANDB:
     case ORB:
@@ -283,15 +282,18 @@ void add_facts(struct LOOP* loop, vpenv env) {
     characterize_trip_count(loop);
 }
 
-// Where a loop's control variable is tested or updated, the hierarchy has the statement in mind.
+// Where a loop's control variable is tested or updated, or a promise has decided whether a loop is entered, the hierarchy
+// has the statement in mind.
 const SYMTAB* symbol_kept_in(const NODE* statement, const BBLK* bb) {
     if (!bb->loop || bb->loop->is_root()) return nullptr;
     INDUCTION_UPDATE update;
     return is_induction_update(statement, &update) ? update.sym : nullptr;
 }
 bool is_left_to_hierarchy(const NODE* statement, const BBLK* bb) {
-    return bb->loop && !bb->loop->is_root() && (statement->op == IF || statement->op == SWITCH) &&
-           (bb == bb->loop->tail || bb == bb->loop->head);
+    if (!bb->loop || (statement->op != IF && statement->op != SWITCH)) return false;
+    const NODE* test = statement->left;
+    return (test->op == COMMAOP && test->right->op == ICON) ||
+           (!bb->loop->is_root() && (bb == bb->loop->tail || bb == bb->loop->head));
 }
 
 void rewrite_block(BBLK* bb, vpenv env) {

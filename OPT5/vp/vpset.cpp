@@ -1,7 +1,7 @@
 // Slices and sets of them.
 //
-// Merging keeps a set small: slices whose common hull adds no member become one, and while there are too many, the two
-// whose hull adds the fewest. A hull holds all members of both, since its step divides both steps and the distance of the low ends.
+// Merging keeps a set small: slices that join without a gap become one, and while there are too many, the two whose hull
+// adds the fewest members, the nearest of those. A hull holds all members of both, since its step divides both steps and the distance of the low ends.
 #include "OPT5/vp/vpset.h"
 
 #include "OPT5/ir/global.h"
@@ -130,19 +130,24 @@ void VPSLICE_LIST::sort() {
 
 void VPSLICE_LIST::merge(int most) {
     for (sort(); count > 1; sort()) {
-        int at = 0, with = 1;
-        WIDE least = -1;
-        for (int i = 0; i < count && least != 0; ++i)
-            for (int j = i + 1; j < count && least != 0; ++j) {
+        int at = 0, with = 0;
+        WIDE least = 0, shortest = 0;
+        bool adds_nothing = false; // and keeps the shape: single values apart stay so
+        for (int i = 0; i < count && !adds_nothing; ++i)
+            for (int j = i + 1; j < count && !adds_nothing; ++j) {
                 const VPSLICE both = hull_of(slices[i], slices[j]);
-                const bool contains = both == slices[i] || both == slices[j];
-                const WIDE cost = contains ? 0 : vpslice_size(both) - vpslice_size(slices[i]) - vpslice_size(slices[j]);
-                if (least >= 0 && cost >= least) continue;
-                least = std::max(cost, static_cast<WIDE>(0)); // overlapping slices count their members twice
+                const WIDE cost = vpslice_size(both) - vpslice_size(slices[i]) - vpslice_size(slices[j]),
+                           length = both.high - both.low;
+                adds_nothing = both == slices[i] || both == slices[j] ||
+                               (slices[i].high < slices[j].low && cost <= 0 &&
+                                (both.step <= std::max(slices[i].step, slices[j].step) || both.step == 1));
+                if (with && !adds_nothing && (cost > least || (cost == least && length >= shortest))) continue;
+                least = cost;
+                shortest = length;
                 at = i;
                 with = j;
             }
-        if (least > 0 && count <= most) return;
+        if (!adds_nothing && count <= most) return;
         slices[at] = hull_of(slices[at], slices[with]);
         erase(with);
     }

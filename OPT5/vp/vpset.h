@@ -30,7 +30,7 @@ public:
     VPSLICE& operator[](int i) { return slices[i]; }
     void erase(int i);
     void sort();
-    void merge(int most); // until there are no more than `most`, and no two have a hull that adds nothing
+    void merge(int most); // until there are no more than `most`, and no two join without a gap
 
 private:
     VPSLICE slices[MOST];

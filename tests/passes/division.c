@@ -24,9 +24,10 @@ int counters(int n) {
     return s + head;
 }
 
-// Each may become negative: by steps down, by a wider or an unsigned number, by the caller, through a pointer.
+// Each may become negative: by a wider or an unsigned number, by the caller, through a pointer; what steps down is -10.
 // FUNCTION: signs_unknown
-// COUNT 4: >> 15 & 3
+// COUNT 3: >> 15 & 3
+// COUNT 1: * 100 - 2
 int signs_unknown(int n, unsigned u, int *p) {
     int down = 2, wide = 0, wrapped = 0, pointed = 0, *q = &pointed;
     while (down > -9) {

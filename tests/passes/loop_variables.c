@@ -29,7 +29,7 @@ long too_far(void) {
 // COUNT 0: int, class 22
 long unknown_end(long n) {
     long k;
-    for (k = 0; k < n; k++) w[k] += k;
+    for (k = 0; k < n; k++) w[k & 15] += k;
     return k;
 }
 

@@ -204,7 +204,7 @@ void kept_apart(const int *restrict x, int *restrict y, int n) {
 // A pointer of an inner loop with a known trip count continues from where that loop left it; not where it may be left early,
 // where the outer counter steps ahead of it, or where the count is not known.
 // FUNCTION: nests
-// COUNT 5: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
+// COUNT 4: /[$]O[$]P[0-9]+ = [$]O[$]P[0-9]+$/
 long nests(int n, int k) {
     long s = 0;
     for (int i = 0; i < 8; i++)

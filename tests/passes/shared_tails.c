@@ -7,14 +7,14 @@ int g, h;
 // FUNCTION: tails
 // COUNT 1: _h = 
 // COUNT 1: /return .*\* 3/
-int tails(int x) {
+int tails(int x, int y) {
     switch (x) {
-    case 1: h = x + 1; return g * 3;
-    case 9: h = x + 1; return g * 3;
+    case 1: h = y + 1; return g * 3;
+    case 9: h = y + 1; return g * 3;
     case 70: g = 7; break;
     default: g = 8;
     }
-    h = x + 1;
+    h = y + 1;
     return g * 3;
 }
 
@@ -28,10 +28,10 @@ int unlike(int x) {
 }
 
 int main(void) {
-    put_i16(tails(1) + h);
-    put_i16(tails(9) + h);
-    put_i16(tails(70) + h);
-    put_i16(tails(2) + h);
+    put_i16(tails(1, 1) + h);
+    put_i16(tails(9, 9) + h);
+    put_i16(tails(70, 70) + h);
+    put_i16(tails(2, 2) + h);
     put_i16(unlike(1) + h);
     put_i16(unlike(0) + h);
     return 0;

@@ -1,0 +1,116 @@
+// What values a variable may have decides tests, remainders and choices; what it may not have does not.
+// RUN: --opt_level=2 --disable_inlining
+// LEVELS: 1 3
+#include <zrun.h>
+
+int x[100], h;
+
+// A sum of at most 100 amounts of 1 or 2 is 300 at no time; on the way there it is 50 once.
+// FUNCTION: accumulated
+// COUNT 1: _h += 1
+// COUNT 0: _h += 100
+int accumulated(void) {
+    int i, s = 0;
+    for (i = 0; i < 100; i++) {
+        s += 1 + (x[i] & 1);
+        if (s == 50) h++;
+        if (s > 200) h += 100;
+    }
+    return s;
+}
+
+// FUNCTION: doubled
+// HAS: /if .*s > 1000/
+int doubled(int n) {
+    int k, s = 1;
+    for (k = 0; k < (n & 15); k++) s += s;
+    if (s > 1000) h += 3;
+    return s;
+}
+
+// Past the end of its type an unsigned counter goes on from 0.
+// FUNCTION: wrapped
+// COUNT 1: u += 1
+int wrapped(unsigned u) {
+    int steps = 0;
+    if (u < 65530u) return -1;
+    while (u >= 10) u++, steps++;
+    return steps;
+}
+
+// FUNCTION: ranges
+// HAS: return (unsigned int)v <u 10 ? 3 : 4
+int ranges(int v) {
+    if ((unsigned)v < 10u) {
+        if (v < 0) return 1;
+        if (v > 9) return 2;
+        return 3;
+    }
+    return 4;
+}
+
+// FUNCTION: remainders
+// HAS: return ((n > 12 ? -13 : 7) + n) * 100 + n
+int remainders(int n) {
+    if (n >= 0 && n < 20) return n % 20 + (n + 7) % 20 * 100;
+    return 0;
+}
+
+// FUNCTION: of_either_sign
+// COUNT 1: >> 15
+int of_either_sign(int n) {
+    if (n < -8 || n > 8) return 0;
+    return n % 4;
+}
+
+// FUNCTION: other
+// HAS: return 12 - v
+int other(int n) {
+    int v = n & 1 ? 5 : 7;
+    x[3] = v;
+    return v == 5 ? 7 : 5;
+}
+
+// The cases leave 1 and 3; the default leaves anything else.
+// FUNCTION: cases
+// COUNT 0: _h = 77
+// COUNT 1: _h = 78
+int cases(int n) {
+    switch (n) {
+    case 1:
+    case 3:
+        if (n == 2) h = 77;
+        return n + h;
+    default:
+        if (n > 4) h = 78;
+        return h;
+    }
+}
+
+// A loop that only passes a variable on does not make it larger; one that steps down to 0 leaves it there.
+// FUNCTION: nested
+// COUNT 0: _h = 79
+int nested(void) {
+    int i, j, k = 3, n = 0;
+    for (i = 0; i < 9; i++)
+        for (j = 20; j > 0; j -= 5) {
+            if (j > 20 || k > 3 || i > 8) h = 79;
+            n += x[i + j];
+        }
+    return n + j;
+}
+
+int main(void) {
+    int i;
+    for (i = 0; i < 100; i++) x[i] = i * 7;
+    put_i16(accumulated() + h);
+    for (i = 0; i < 14; i++) put_i16(doubled(i));
+    put_i16(wrapped(65530u));
+    put_i16(wrapped(12));
+    for (i = -12; i < 24; i++) {
+        put_i16(ranges(i) + remainders(i) * 3 + of_either_sign(i) * 5);
+        put_i16(other(i) + cases(i));
+    }
+    put_i16(nested() + h);
+    return 0;
+}

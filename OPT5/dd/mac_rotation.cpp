@@ -129,7 +129,8 @@ void read_square_from_memory(BBLK* bb) {
         const NODE* load = (*link)->first;
         NODE* t = (*link)->rest->first;
         if (load->op != ASG || load->left->op != NAME || load->right->op != UMULT || !is_sum_into_target(t)) continue;
-        if (!load->right->type->is_int() || load->right->type->size != 16) continue;
+        if (!load->right->type->is_int() || load->right->type->size != 16 || tree_has_side_effects(load->right))
+            continue;
         SYMTAB* sym = load->left->u.sym;
         if (squared_variable(t->right) != sym || !is_a_likely_zelkova_register(sym) ||
             lvalue_is_volatile(load->right) || !equiv_mtypes(load->left->type, load->right->type))

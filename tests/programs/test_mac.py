@@ -131,6 +131,7 @@ class Mac(unittest.TestCase):
         functions = [product_of(form, walk) % f"f{i}" for i, (form, walk) in enumerate(cases)]
         calls = [f"put_{FLOATS.get(c[0][0], 'i32')}(f{i}({c[0][1]}, {c[0][2]}));" for i, c in enumerate(cases)]
         for options in (["--opt_level=2", "--float_support=fpu64", "--unified_memory"], ["--opt_level=4"],
+                        ["--opt_level=2", "--opt_passes=77,28,78,67"],  # steps within references come first
                         ["--opt_level=3", "--float_support=fpu32", "--size_speed_goal=5"]):
             parts = Program(functions, calls).optimized(self, options)
             if "--unified_memory" not in options:

@@ -149,10 +149,10 @@ size_t BINDINGS::HASH::operator()(const PTENV* e) const {
     return h;
 }
 
-bool BINDINGS::EQUAL::operator()(const PTENV* a, const PTENV* b) const {
-    return a->categories == b->categories && a->align == b->align && a->parm == b->parm &&
-           a->parm_offset == b->parm_offset && a->parm_stride == b->parm_stride &&
-           std::equal(a->targets.begin(), a->targets.end(), b->targets.begin(), b->targets.end(),
+bool equal_bindings(const PTENV& a, const PTENV& b) {
+    return a.categories == b.categories && a.align == b.align && a.parm == b.parm && a.parm_offset == b.parm_offset &&
+           a.parm_stride == b.parm_stride &&
+           std::equal(a.targets.begin(), a.targets.end(), b.targets.begin(), b.targets.end(),
                       [](const PTVAR& x, const PTVAR& y) {
                           return x.base == y.base && x.offset == y.offset && x.stride == y.stride && x.align == y.align;
                       });

@@ -6,6 +6,7 @@
 #include "OPT5/ir/side_table.h"
 
 #include <deque>
+#include <functional>
 #include <unordered_map>
 #include <unordered_set>
 
@@ -18,6 +19,7 @@ PTVAR make_target(SYMTAB* base, int64_t offset, int64_t stride);
 inline bool is_covered(const PTVAR& t, uint32_t categories) { return (class_category(t.base) & categories) != 0; }
 // Puts targets in order and covered ones into the categories; too many of them become categories.
 void settle(PTENV& e);
+bool equal_bindings(const PTENV& a, const PTENV& b);
 PTENV meet_bindings(const PTENV& a, const PTENV& b);
 // The pointer plus `constant`, plus any multiple of `stride`.
 PTENV shifted(PTENV e, int64_t constant, int64_t stride);
@@ -35,7 +37,7 @@ private:
         size_t operator()(const PTENV* e) const;
     };
     struct EQUAL {
-        bool operator()(const PTENV* a, const PTENV* b) const;
+        bool operator()(const PTENV* a, const PTENV* b) const { return equal_bindings(*a, *b); }
     };
     std::deque<PTENV> records;
     std::unordered_set<const PTENV*, HASH, EQUAL> table;
@@ -142,14 +144,15 @@ PT_STORE* PT_store(); // of the current function while the fact is known, or nul
 class PT_TRANSFER {
 public:
     explicit PT_TRANSFER(PT_STORE& s) : store(s) {}
-    // `s` becomes what holds behind the statement. `at_accesses`: its accesses get their bindings.
-    void statement(const NODE* t, PT_STATE& s, bool at_accesses);
+    // `s` becomes what holds behind the statement. `look` gets the tree with what holds while it is evaluated.
+    using LOOK = std::function<void(const NODE*, const PT_STATE&)>;
+    void statement(const NODE* t, PT_STATE& s, const LOOK& look = {});
+    void bind_accesses(const NODE* tree, const PT_STATE& s); // gives its accesses their bindings
     // A pointer expression; null for anything.
     const PTENV* evaluate(const NODE* pointer, const PT_STATE& s);
 
 private:
     const PTENV* of_base(const NODE* base, const PT_STATE& s);
-    void bind_accesses(const NODE* tree, const PT_STATE& s);
     void drop_exposed(const WRITE& w, PT_STATE& s);
     void drop_written(const WRITE& w, PT_STATE& s);
     const PTENV* assigned_value(const NODE* t, unsigned pointer, const PT_STATE& s);
@@ -161,3 +164,7 @@ private:
 };
 // The pointer variable that a tree is as a whole, if bindings of it are kept; `PT_STORE::NONE` for any other tree.
 unsigned simple_pointer(const PT_STORE& store, const NODE* t);
+
+// ---- Across calls (points_to_calls.cpp)
+
+AARG passed_value(FUNINFO* callee, size_t index, const NODE* argument, const PTENV* e); // by the current function

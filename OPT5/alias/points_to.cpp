@@ -89,11 +89,13 @@ PT_STATE PROPAGATION::at_function_entry() {
     PT_STATE s;
     for (unsigned i = 0; i < store.pointers.size(); ++i) {
         SYMTAB* sym = store.pointers[i].sym;
-        if (sym->level != 1) continue;
+        if (sym->level != 1 || !sym->written_as_parameter) continue;
         PTENV e;
+        const PTENV* summary = nullptr;
+        if (find_PT_in_formal_parms(&summary, sym)) e = *summary;
         e.parm = sym;
-        e.categories = PT_ALL & ~PT_AUTOL;
-        e.align = std::max(16u, sym->type->type_pointed_to()->align);
+        e.categories = summary ? e.categories & ~PT_AUTOL : PT_ALL & ~PT_AUTOL;
+        if (!summary) e.align = std::max(16u, sym->type->type_pointed_to()->align);
         store.bind(i, store.bindings.intern(std::move(e)), s);
     }
     return s;
@@ -117,7 +119,7 @@ bool PROPAGATION::visit(BLOCK& b) {
     if (b.is_reached && store.equal(in, store.into[b.bb])) return false;
     store.into[b.bb] = in;
     PT_STATE out = in;
-    for (const NODE* t : b.acting) transfer.statement(t, out, false);
+    for (const NODE* t : b.acting) transfer.statement(t, out);
     const bool is_new = !b.is_reached || !store.equal(out, store.out_of[b.bb]);
     b.is_reached = true;
     store.out_of[b.bb] = out;
@@ -146,6 +148,11 @@ bool PROPAGATION::propagate() {
     return true;
 }
 
+void walk(const BBLK* bb, const PT_STORE& store, PT_TRANSFER& transfer, const PT_TRANSFER::LOOK& look) {
+    PT_STATE s = store.into[bb];
+    for (const LIST* l = bb->statements; l; l = l->rest) transfer.statement(l->first, s, look);
+}
+
 void PROPAGATION::run() {
     find_pointers();
     if (store.pointers.empty()) return;
@@ -153,11 +160,9 @@ void PROPAGATION::run() {
         store.into = store.out_of = SIDE_TABLE<PT_STATE>();
         return;
     }
-    for (BLOCK& b : blocks) {
-        if (!b.is_reached) continue;
-        PT_STATE s = store.into[b.bb];
-        for (const LIST* l = b.bb->statements; l; l = l->rest) transfer.statement(l->first, s, true);
-    }
+    for (const BLOCK& b : blocks)
+        if (b.is_reached)
+            walk(b.bb, store, transfer, [this](const NODE* t, const PT_STATE& s) { transfer.bind_accesses(t, s); });
 }
 
 void dump_state(const PT_STORE& store, const PT_STATE& s) {
@@ -221,6 +226,27 @@ uint32_t PT_STORE::next_run() {
 
 PT_STORE* PT_store() {
     return is_known(fact::points_to) ? static_cast<PT_STORE*>(currfuninfo->points_to.get()) : nullptr;
+}
+
+void find_pointer_arguments(std::vector<AARG>& arguments) {
+    need(fact::points_to);
+    PT_STORE& store = *PT_store();
+    PT_TRANSFER transfer(store);
+    const auto look = [&](const NODE* tree, const PT_STATE& s) {
+        for_each_subtree(tree, [&](const NODE* t) {
+            FUNINFO* callee = op_is_call(t->op) ? find_FUNINFO_for_call(t) : nullptr;
+            if (!callee) return;
+            const auto passed = static_cast<size_t>(arg_list_count(get_arguments_to_call(t)));
+            for (size_t i = 0; i < callee->formals.size(); ++i) {
+                if (!callee->formals[i].is_pointer) continue;
+                const NODE* a = i < passed ? arg_list_lookup(const_cast<NODE*>(get_arguments_to_call(t)), static_cast<int>(i)) : nullptr;
+                arguments.push_back(passed_value(callee, i, a, a ? transfer.evaluate(a, s) : nullptr));
+            }
+        });
+    };
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) walk(bb, store, transfer, look);
+    for (const EHT_ITEM& item : currfuninfo->eht)
+        if (item.cleanup) look(item.cleanup, PT_STATE());
 }
 
 void propagate_PT_info() { need(fact::points_to); }

@@ -14,13 +14,16 @@
 #include "XINT/int65.h"
 
 #include <cstdint>
+#include <string>
 #include <vector>
 
 class BBLK;
+class FUNINFO;
 class NODE;
 class SYMTAB;
 class TYPE;
 struct ADDRESS_FORM;
+struct FPARM;
 
 // Kinds of storage.
 enum PT_CATEGORY : uint32_t {
@@ -63,6 +66,24 @@ const PTENV* PT_info_of(const NODE* lvalue); // null where nothing is known, or 
 void carry_PT_info(NODE* copy, const NODE* original); // of the two lvalues, not of those inside
 // The accesses, which are congruent, get what holds for all of them.
 void share_PT_info(const std::vector<NODE*>& accesses);
+
+// ---- Across calls. Only a function that nothing but the calls that are looked at enters has `formals`
+// What a call passes in a pointer parameter.
+struct AARG {
+    FUNINFO *caller, *callee;
+    size_t index;             // of the parameter, from 0
+    bool is_known;            // the fields below say what it is; otherwise it is anything
+    PTENV value;              // as the callee sees it: without locals of the caller, and without `parm`
+    std::string parm;         // where it is not empty: what the caller got in this parameter, and so far on
+    int64_t parm_offset, parm_stride;
+    std::string text;         // for the debug stream
+};
+// Adds those of all calls in the current function's body, where the callee has `formals`. Needs no fact.
+void find_pointer_arguments(std::vector<AARG>& arguments);
+// Takes what is passed into the parameter's summary. Whether that changed it: to be done until nothing changes.
+bool meet_FPARM_with_PT_info(FPARM* formal, const AARG* argument);
+// Whether there is a summary of the parameter `sym` of the current function, which lives as long as its record.
+bool find_PT_in_formal_parms(const PTENV** out, const SYMTAB* sym);
 
 // ---- Questions. Bindings may be null
 unsigned overall_PT_align(const PTENV* e); // 16 for null

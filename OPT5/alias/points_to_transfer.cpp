@@ -223,12 +223,17 @@ void PT_TRANSFER::refine(const NODE* c, PT_STATE& s) {
     refine_pointer(c->op, c->right, c->left, s);
 }
 
-void PT_TRANSFER::statement(const NODE* t, PT_STATE& s, bool at_accesses) {
+void PT_TRANSFER::statement(const NODE* t, PT_STATE& s, const LOOK& look) {
     t = below_SSA(t);
+    if (t->op == COMMAOP || t->op == PCOMMA) { // one behind the other
+        statement(t->left, s, look);
+        if (t->right) statement(t->right, s, look);
+        return;
+    }
     for_each_write(t, [&](const WRITE& w) {
         if (w.by != t) drop_written(w, s);
     });
-    if (at_accesses) bind_accesses(t, s);
+    if (look) look(t, s);
     if (t->op == ASSERT || t->op == NASSERT)
         refine(t->left, s);
     else

@@ -4,6 +4,7 @@
 
 void init_ipcp_for_fun();
 void do_interprocedural_propagation();
+void summarize_pointer_parameters(); // at level 3: FUNINFO::formals of all functions
 void analyze_cg_for_ipcp();
 
 void beta_parms();

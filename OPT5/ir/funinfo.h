@@ -26,6 +26,7 @@ class Dominator;
 class NATURAL_LOOPS;
 class FUNINFO;
 class NODE;
+struct PTENV;
 class SNMAP;
 class SPMAP;
 struct LBL;
@@ -86,6 +87,15 @@ struct EHT_ITEM {
 };
 
 struct OVERLAP; // a record of the stack-sharing tree
+
+// A formal parameter, and what all calls together pass in it (OPT5/alias/points_to.h).
+struct FPARM {
+    enum STATE : uint8_t { NO_CALL, KNOWN, ANYTHING };
+    std::string name;
+    bool is_pointer;
+    STATE state = NO_CALL;
+    std::shared_ptr<const PTENV> summary; // of a known pointer
+};
 
 class FUNINFO : public serial_namespace<BBLK, FUNINFO> {
 public:
@@ -164,6 +174,7 @@ public:
     void* hierarchy = nullptr;
     CODE_RECORDS code_records;
     std::vector<NODE*> givens; // facts that hold in the whole function
+    std::vector<FPARM> formals; // in order, of a function all of whose calls are known; empty otherwise
     std::vector<std::string> comments;  // comment lines ahead of the function in the output
     std::vector<std::string> info_text; // buffered info text of the worker mode
     // The function's view of global symbols by their index.

@@ -387,6 +387,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     }
     // The alias rules are asked about the address as it was, not about a temporary.
     NODE* place = t->left->op == NAME ? nullptr : copy_tree(t->left);
+    if (place) carry_PT_info(place, t->left);
     read_place(t->left, true);
     if (place) std::swap(t->left, place);
     numbers.forget_changed(t);

@@ -209,10 +209,15 @@ bool tree_changes_nothing(const NODE* tree) {
     });
 }
 
-bool call_is_pure(const NODE* call) {
-    if (call->op != CALL || !call->type->is_scalar()) return false;
+const void* pure_callee(const NODE* call) {
+    if (!call->type->is_scalar()) return nullptr;
+    if (call->op == ICALL) {
+        const bool is_pure = ok_to_CSE_ICALL(call) && !any_argument_reaches(call, nullptr, nullptr, false);
+        return is_pure ? find_BIF_descriptor(call->u.name) : nullptr;
+    }
+    if (call->op != CALL) return nullptr;
     FUNINFO* f = find_FUNINFO_for_call(call);
-    return f && TEST_FLAG(f, FUN_is_pure_fun) && !TEST_FLAG(f, FUN_never_returns);
+    return f && TEST_FLAG(f, FUN_is_pure_fun) && !TEST_FLAG(f, FUN_never_returns) ? get_callee_for_call(call) : nullptr;
 }
 
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {

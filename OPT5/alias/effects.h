@@ -82,8 +82,9 @@ bool tree_acts(const NODE* tree);
 
 // Whether evaluating `tree` leaves all that a tree may read as it is: its only acts are calls that write nothing.
 bool tree_changes_nothing(const NODE* tree);
-// Whether a call does nothing but compute a scalar from its arguments, the same each time, if it returns.
-bool call_is_pure(const NODE* call);
+// What a call, a CALL or an ICALL, computes by: the callee's symbol or the built-in's descriptor. Null unless it does
+// nothing but compute a scalar from its arguments, the same each time, if it returns.
+const void* pure_callee(const NODE* call);
 
 // ---- Changes
 

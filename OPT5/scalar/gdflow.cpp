@@ -17,6 +17,7 @@
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/scalar/subrange.h"
 #include "OPT5/scalar/triples.h"
+#include "OPT5/target/bif.h"
 
 #include <boost/container_hash/hash.hpp>
 
@@ -184,7 +185,8 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
-    if (!call_is_pure(t) || !type_code(t->type)) return {};
+    const void* callee = pure_callee(t);
+    if (!callee || !type_code(t->type)) return {};
     KNOWN k;
     k.cost = weight_of_operator(t);
     NODE* list = get_arguments_to_call(t);
@@ -197,7 +199,7 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
         arguments = number_of_key({COMMA, 0, 0, arguments, a.number});
     }
     if (k.nodes > MOST_NODES) return {};
-    k.number = number_of_key({CALL, type_code(t->type), identity(get_callee_for_call(t)), arguments, 0});
+    k.number = number_of_key({t->op, type_code(t->type), identity(callee), arguments, 0});
     return k;
 }
 
@@ -208,7 +210,7 @@ ANNOTATOR::KNOWN ANNOTATOR::number(const NODE* t) {
 
 ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
     if (number_of_operands[t->op] == 0 || t->op == NAME) return number_of_leaf(t);
-    if (t->op == CALL) return number_of_call(t);
+    if (t->op == CALL || t->op == ICALL) return number_of_call(t);
     const bool is_member = t->op == STDOT || t->op == STREF;
     const bool is_load = t->op == UMULT || is_member;
     if ((!op_is_computed(t->op) && !is_load && t->op != UAND && t->op != ISP2CHAR) ||
@@ -238,7 +240,7 @@ TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
     t.tree = const_cast<NODE*>(tree);
     t.cost = cost;
     for_each_subtree(tree, [&t](const NODE* n) {
-        if (n->op == DIV || n->op == MOD || n->op == CALL) t.may_trap = true;
+        if (n->op == DIV || n->op == MOD || n->op == CALL || n->op == ICALL) t.may_trap = true;
         if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
         if (n->op != NAME || !n->u.sym || n->u.sym->is_function()) return;
         if (!only_its_name_reaches(n->u.sym)) // an address of it costs nothing to ask about
@@ -268,6 +270,9 @@ void ANNOTATOR::read_operands(NODE* t, bool is_certain) {
     case STARG:
     case STDOT: return read_place(t->left, is_certain);
     case STREF: return read(t->left, is_certain);
+    case ICALL:
+        if (ok_to_CSE_ICALL_opds(t)) read(t->left, is_certain);
+        return;
     case ANDAND:
     case OROR:
     case QUEST: read(t->left, is_certain); return read(t->right, false);
@@ -294,7 +299,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
     case SWITCH: return read_operands(t->left, true);
     case CALL: return read_operands(t, true);
     default:
-        if ((t->right->op == CALL && !call_is_pure(t->right)) || t->op == STASG)
+        if ((t->right->op == CALL && !pure_callee(t->right)) || t->op == STASG)
             read_operands(t->right, true);
         else
             read(t->right, true);

@@ -29,6 +29,7 @@
 #include "OPT5/scalar/subrange.h"
 #include "OPT5/scalar/triples.h"
 #include "OPT5/simp/seq.h"
+#include "OPT5/target/bif.h"
 
 #include <algorithm>
 #include <cmath>
@@ -183,7 +184,8 @@ VALUE NUMBERS::find(const NODE* t) {
     case STDOT:
     case STREF: return of_load(t);
     case ISP2CHAR: return t->left->type->is_pointer() && t->type->is_pointer() ? of(t->left) : fresh();
-    case CALL: return call_is_pure(t) ? of_call(t) : fresh();
+    case CALL:
+    case ICALL: return of_call(t);
     default: return op_is_computed(t->op) ? of_operator(t) : fresh();
     }
 }
@@ -206,12 +208,13 @@ VALUE NUMBERS::of_operator(const NODE* t) {
 }
 
 VALUE NUMBERS::of_call(const NODE* t) {
-    if (!type_code(t->type)) return fresh();
+    const void* callee = pure_callee(t);
+    if (!callee || !type_code(t->type)) return fresh();
     NODE* list = get_arguments_to_call(t);
     VALUE arguments = 0;
     for (int i = 0, n = arg_list_count(list); i < n; ++i)
         arguments = computed_as({COMMA, 0, 0, arguments, of(arg_list_lookup(list, i))});
-    return computed_as({CALL, type_code(t->type), identity(get_callee_for_call(t)), arguments, 0});
+    return computed_as({t->op, type_code(t->type), identity(callee), arguments, 0});
 }
 
 VALUE NUMBERS::of_address(const NODE* place) {
@@ -359,7 +362,7 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
 }
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
-    return t->op == ASG && is_private_name(t->left) && (t->right->op != CALL || call_is_pure(t->right)) &&
+    return t->op == ASG && is_private_name(t->left) && (t->right->op != CALL || pure_callee(t->right)) &&
            type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->type) &&
            numbers.of(t->right) == numbers.of(t->left);
 }
@@ -377,7 +380,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     }
     VALUE v = 0;
     const bool is_plain = t->op == ASG || t->op == STASG;
-    if ((t->right->op == CALL && !call_is_pure(t->right)) || t->op == STASG) {
+    if ((t->right->op == CALL && !pure_callee(t->right)) || t->op == STASG) {
         read_operands(t->right, true);
         if (t->op == ASG) v = numbers.fresh(); // a call's
     } else {
@@ -458,6 +461,9 @@ void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
         read(t->right, false);
         return;
     case STREF: read(t->left, is_certain); return;
+    case ICALL:
+        if (ok_to_CSE_ICALL_opds(t)) read(t->left, is_certain);
+        return;
     default: read(t->left, is_certain); read(t->right, is_certain);
     }
 }
@@ -499,7 +505,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
     }
     NODE* t = slot;
     if (!good_CSE_tree(t, false) || !type_code(t->type)) return false;
-    if (!op_is_computed(t->op) && !op_is_load(t->op) && t->op != NAME && !call_is_pure(t)) return false;
+    if (!op_is_computed(t->op) && !op_is_load(t->op) && t->op != NAME && !pure_callee(t)) return false;
     const VALUE v = numbers.of(t);
     OCCURRENCES& known = values[v];
     if (SYMTAB* holder = holder_of(known, v, t->type)) {

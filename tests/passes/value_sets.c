@@ -100,8 +100,32 @@ int nested(void) {
     return n + j;
 }
 
+// FUNCTION: shapes
+// NOT: %
+int shapes(int n) {
+    int v = n & 31, w = n >> 11, r = 0;
+    if (v >= 3 && v != 17) r += (v + 30) % 33 + v / 5 * 7;
+    if (w > -9 && w < 4) r += w % 8 * 3 + w / 4;
+    if (w > 2) r += (w + 5) % 13;
+    if (v > 16) r ^= v % (1 << (n & 7)) + (w < 0 ? -w : w);
+    return r + (v == 31 ? 9 : v > 30);
+}
+
+// Over all that an int holds.
+static unsigned sum_of_all(int (*f)(int)) {
+    unsigned sum = 0;
+    long n;
+    for (n = -32768; n < 32768; n++) sum = sum * 5 + f(n);
+    return sum;
+}
+
 int main(void) {
     int i;
+    put_u32(sum_of_all(shapes));
+    put_u32(sum_of_all(ranges));
+    put_u32(sum_of_all(remainders));
+    put_u32(sum_of_all(of_either_sign));
+    put_u32(sum_of_all(other));
     for (i = 0; i < 100; i++) x[i] = i * 7;
     put_i16(accumulated() + h);
     for (i = 0; i < 14; i++) put_i16(doubled(i));

@@ -175,6 +175,7 @@ struct BLOCK_STATE {
     BBLK* bb = nullptr;
     std::vector<VP_EFFECT> effects; // those that are any, the control statement's among them
     std::vector<size_t> in, out;    // edges
+    const NODE* may_be_left = nullptr; // the statement ahead of the control statement
     bool heads_loop = false;           // a natural one, which
     std::vector<int> altered;          // changes these, and
     bool alters_globals = false;
@@ -240,6 +241,7 @@ void VALUE_SETS::read_graph() {
         blocks[i].bb = order[i];
         number_of[order[i]] = static_cast<int>(i);
         for (const LIST* s = order[i]->statements; s; s = s->rest) {
+            if (s->rest) blocks[i].may_be_left = s->first;
             VP_EFFECT effect(s->first);
             if (!effect.is_none()) blocks[i].effects.push_back(std::move(effect));
         }
@@ -466,6 +468,11 @@ void VALUE_SETS::evaluate(BLOCK_STATE& b, int pass) {
         if (!b.updated.empty()) update_amounts(b, effect, effect.during(env), pass);
         env = effect.behind(env, true);
     }
+    // A call that throws leaves its statement before that assigns.
+    if (tree_is_EH_SWITCH(b.bb->branch()))
+        for (const VP_EFFECT& effect : b.effects)
+            if (effect.statement() == b.may_be_left && effect.assigned_symbol() >= 0)
+                env = vpenv_store->bind(env, effect.assigned_symbol(), vpset());
     b.exit = env;
     leave(b);
 }

@@ -549,6 +549,7 @@ VP_EFFECT::VP_EFFECT(const NODE* statement) : tree(statement) {
             return;
         }
         const NODE* name = name_of_place(w.place);
+        if (!name) loses_globals = true; // an address may be one that a global was put at by hand
         const int number = name && name->u.sym ? vpenv_store->number_of(name->u.sym) : -1;
         if (number < 0) return;
         if (w.by == tree && tree->left == name && is_tracked_as(name, number) && assigns_known_value(tree))

@@ -100,6 +100,23 @@ int nested(void) {
     return n + j;
 }
 
+// What a call throws out of is not assigned.
+static int thrown(int n) {
+    if (n & 1) zthrow(n);
+    return n;
+}
+// FUNCTION: handled
+// HAS: /v (==|!=) 50/
+int handled(int n) {
+    int v = 50;
+    __eh_catch("...", caught);
+    v = thrown(n) & 7;
+    __eh_end();
+    return v;
+caught:
+    return v == 50 ? 1000 + zcaught() : v;
+}
+
 // FUNCTION: shapes
 // NOT: %
 int shapes(int n) {
@@ -131,6 +148,7 @@ int main(void) {
     for (i = 0; i < 14; i++) put_i16(doubled(i));
     put_i16(wrapped(65530u));
     put_i16(wrapped(12));
+    put_i16(handled(3) + handled(4));
     for (i = -12; i < 24; i++) {
         put_i16(ranges(i) + remainders(i) * 3 + of_either_sign(i) * 5);
         put_i16(other(i) + cases(i));

@@ -38,10 +38,8 @@ bool delete_NASSERTs() {
     return any;
 }
 
-// Copies of memory have no destinations to be wrapped on this target, whose memory has no banks; pairs of clones that lost
-// one are not built yet.
+// On this target copies of memory have no destinations to be wrapped, and memory has no banks to be told of.
 void wrap_memcpy_destinations() {}
-void unmark_singleton_clones(struct LOOP*) {}
 void write_dd_mbank_info() {}
 
 // Deep sums keep the shape that the simplifier gave them.

@@ -2,7 +2,6 @@
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/ssa.h"
 
-void report_ambiguous_aliases(struct LOOP*) {}
 void undeltafy_dd_loops(struct LOOP*) {}
 void collapse_dd_loops(struct LOOP*) {}
 void coalesce_dd_loops(struct LOOP*) {}

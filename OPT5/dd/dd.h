@@ -22,6 +22,8 @@ void denormalize_unchanged_trees(); // of steps whose trees are simplified: what
 // local without the qualifier takes the value.
 void split_qualified_parameter_copies();
 
+// Advice on pointers that nothing tells apart, of the loop and those in it (alias_advice.cpp): pragmas of the loops, and
+// text in the information file.
 void report_ambiguous_aliases(struct LOOP* loop);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.

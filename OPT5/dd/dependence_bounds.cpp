@@ -9,6 +9,7 @@
 #include "OPT5/dd/inequalities.h"
 #include "OPT5/dd/reference_form.h"
 
+#include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/simp/symbolic.h"
 
@@ -183,7 +184,14 @@ private:
             for (size_t i = begin; i < at; ++i) g = gcd_of(g, sorted[i].by);
             const WIDE most = -known - low, least = -known - high, rest = most % g, last = most - rest - (rest < 0 ? g : 0);
             if (last < least) return false;
-            if (last - g < least) return split(begin, at, -last, false) && split(at, end, known + last, false);
+            if (last - g < least) {
+                if (print_debug >= 3) {
+                    const char* const told = is_whole ? "~~~#TDS#4\tTesting final decoupled subscripts %d:%d\n"
+                                                      : "~~~#TDS#3\tTesting decoupled subscripts %d:%d\n";
+                    debug_printf(told, static_cast<int>(at), static_cast<int>(end) - 1);
+                }
+                return split(begin, at, -last, false) && split(at, end, known + last, false);
+            }
         }
         if (is_whole) return true;
         INEQUALITIES::SUM part;
@@ -412,6 +420,16 @@ private:
     bool uses_given = false;
 };
 
+void tell(const REFERENCE& a, const DDEP& given, const DDEP* left) {
+    debug_printf("\tSYMBOLIC SUBSCRIPT TEST FOR %s", tree_to_infix(a.root).c_str());
+    if (!left)
+        debug_printf("\n~~~#SYMBOLIC#z    ! WIN !\n\n");
+    else if (*left != given)
+        debug_printf("\n~~~#SSIV#z  WIN\n");
+    else
+        debug_printf("\n~~~#SYMBOLIC#3  LOSE  %s\n\n", left->text().c_str());
+}
+
 } // namespace
 
 void allow_work_on_givens() { work_left = WORK_BY_ANALYSIS; }
@@ -423,7 +441,9 @@ DDEP_PTR narrow_by_givens(DDEP_PTR v, const REFERENCE& a, const REFERENCE& b, st
     if (!system.is_of_use()) return v;
     long work = std::min(work_left, WORK_BY_PAIR);
     const long before = work;
+    const DDEP given = *v;
     const bool is_left = system.narrow(v.get(), low, high, &work);
     work_left -= before - work + 100;
+    if (print_debug >= 3) tell(a, given, is_left ? v.get() : nullptr);
     return is_left ? std::move(v) : nullptr;
 }

@@ -373,3 +373,11 @@ void rebind_clones(struct LOOP* root) {
         rebind_reflection(loop);
     }
 }
+
+void unmark_singleton_clones(struct LOOP* root) {
+    for (struct LOOP* loop : loops_outer_first(root)) {
+        if (!loop->counterpart) loop->flags &= ~uint32_t(LOOP_favored | LOOP_deprecated);
+        if (!loop->reflection)
+            loop->flags &= ~uint32_t(LOOP_unaliased | LOOP_aligned | LOOP_conservative | LOOP_has_trip_predicate);
+    }
+}

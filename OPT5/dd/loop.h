@@ -209,6 +209,8 @@ void assign_loop_numbers(struct LOOP* loop, int number);
 void ensure_proper_preheader_for_loop(struct LOOP* loop);
 void sort_loop_contents_into_DFO(struct LOOP* loop);
 void rebind_clones(struct LOOP* root);
+// A loop without its partner is no clone any more: the code generator is not told that it is one.
+void unmark_singleton_clones(struct LOOP* root);
 void erase_loop_pragmas(struct LOOP* loop); // what the record holds
 struct LOOP* innermost_common_loop(struct LOOP* a, struct LOOP* b);
 bool loop_is_subloop_of_loop(const struct LOOP* inner, const struct LOOP* outer, bool or_same);

@@ -18,6 +18,7 @@
 // that, which is one more unknown.
 #include "OPT5/dd/reference_form.h"
 
+#include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 
 #include <algorithm>
@@ -451,6 +452,10 @@ DDEP_PTR narrow_by_addresses(DDEP_PTR v, const REFERENCE& a, EXTENT ea, const RE
             all->set_union(one.get());
         else
             all = std::move(one);
+    }
+    if (!all && print_debug >= 3) {
+        debug_printf("~~~#TDS#z INDEPENDENT (1) v1: %s\n", tree_to_infix(a.root).c_str());
+        debug_printf("~~~#TDS#z INDEPENDENT (1) v2: %s\n", tree_to_infix(b.root).c_str());
     }
     if (!all || !a.sum.is_exact || !b.sum.is_exact) return all;
     return narrow_by_givens(std::move(all), a, b, common, eb.low - ea.high + 1, eb.high - ea.low - 1, pointersAreFixed);

@@ -88,6 +88,15 @@ void behind(int* p, int n) {
     for (int i = 0; i < n; i++) p[i] = p[i + n] + 1;
 }
 
+// A loop that was said to be one of two clones, and stands alone.
+// FUNCTION: single
+// HAS: /^loop 1 in 0: .* flags 0000$/
+// NOT: LOOP_FLAGS
+void single(int n) {
+#pragma LOOP_FLAGS(192)
+    for (int i = 0; i < n; i++) a[i] += 1;
+}
+
 // A nest has the vectors of two levels, and those that hold if the outer loop is taken to carry nothing.
 // FUNCTION: nest
 // HAS: /^dependence vector 0, flags 08: =0 <1\S* =/
@@ -102,7 +111,7 @@ int main(void) {
     static long wide[9];
     static float real[9] = {1, 2, 3};
     static int square[20][20];
-    once();
+    once(), single(9);
     again(9);
     disjoint(a, b, 20), disjoint(a, a + 101, 20);
     near(a, a + 60);

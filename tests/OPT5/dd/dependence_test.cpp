@@ -3,6 +3,7 @@
 #include "../ir/function_fixture.h"
 
 #include "OPT5/dd/dd.h"
+#include "OPT5/dd/dependence_graph.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/symbol_maps.h"
@@ -327,6 +328,49 @@ public:
         return 0;
     }
 
+    // Canonical subscripts have the value of the difference, modulo its width; what has one value in which loops.
+    template <class PICK>
+    void check_subscripts(const ACCESS& a, const ACCESS& b, const PICK& pick) {
+        NODE *x = index(a, nest.size()), *y = index(b, nest.size());
+        const auto canonical = [&](const NODE* of, const NODE* less) {
+            const bool simplify = pick() > 0;
+            return less ? canonicalize_ss_delta(of, less, a.loop, simplify) : canonicalize_symbolic_ss(of, a.loop, simplify);
+        };
+        NODE *one = canonical(x, nullptr), *both = canonical(x, y);
+        for (int n = 0; n < 8; ++n) {
+            std::map<const SYMTAB*, int64_t> values{{unknown, pick()}};
+            for (size_t l = 0; l < nest.size(); ++l) values[counter[l]] = pick();
+            const auto low_bits = [](int64_t v) { return static_cast<uint16_t>(v); };
+            EXPECT_EQ(low_bits(value_in(one, values)), low_bits(value_in(x, values)));
+            EXPECT_EQ(low_bits(value_in(both, values)), low_bits(value_in(x, values) - value_in(y, values)));
+        }
+        for (NODE* t : {x, y, one, both}) erase_tree(t);
+        for (int level = 1; level <= a.loop->level; ++level) {
+            NODE* name = mk_NAME(counter[static_cast<size_t>(level) - 1]);
+            DDEP vector(a.loop->level, true);
+            for (int k = 1; k <= level; ++k) vector.ddve(k).clr_FWD_BWD_dirs();
+            EXPECT_EQ(tree_is_RC_in_loop_nest(name, a.loop, &vector), level < a.loop->level);
+            vector.ddve(level).set_ALL_dirs();
+            EXPECT_FALSE(tree_is_RC_in_loop_nest(name, a.loop, &vector));
+            EXPECT_EQ(tree_is_RC_in_common_loop(name, a.loop, b.loop), level < innermost_common_loop(a.loop, b.loop)->level);
+            erase_tree(name);
+        }
+    }
+    static int64_t value_in(const NODE* t, const std::map<const SYMTAB*, int64_t>& values) {
+        if (!t) return 0;
+        switch (t->op) {
+        case ICON: return static_cast<int64_t>(t->u.lval.value);
+        case NAME: return values.at(t->u.sym);
+        case PLUS: return value_in(t->left, values) + value_in(t->right, values);
+        case MINUS: return value_in(t->left, values) - value_in(t->right, values);
+        case MULT: return value_in(t->left, values) * value_in(t->right, values);
+        case UMINUS: return -value_in(t->left, values);
+        case SLL: return value_in(t->left, values) << value_in(t->right, values);
+        case SCONV: return value_in(t->left, values);
+        default: ADD_FAILURE() << tree_to_infix(t); return 0;
+        }
+    }
+
     void check(const ACCESS& a, const ACCESS& b, TALLY* tally) {
         const int order = (b.position > a.position) - (b.position < a.position);
         const std::set<COUNTS> met = meetings(a, b);
@@ -465,6 +509,36 @@ TEST_P(RandomNests, EveryMeetingIsInTheVector) {
     EXPECT_GE(plain.exact * 100, plain.vectors * 75);
 }
 INSTANTIATE_TEST_SUITE_P(Seeds, RandomNests, testing::Range(1, 4));
+
+// ---- The graph, and subscripts as trees
+
+TEST_P(RandomNests, GraphAndSubscriptsAgreeWithTheVectors) {
+    random.seed(static_cast<unsigned>(GetParam()) + 100);
+    for (int n = 0; n < 60; ++n) {
+        PROGRAM p;
+        choose(&p);
+        p.make_program();
+        const ACCESS *a = &p.accesses[0], *b = &p.accesses[1];
+        p.check_subscripts(*a, *b, [this] { return pick(-9, 9); });
+        if (a->position > b->position) std::swap(a, b);
+        DDGRAPH graph;
+        graph.build(loop_root(), false, 0);
+        DDEP_PTR forward, backward;
+        compute_dependence_vectors(&forward, &backward, 1, a->tree, a->loop, b->tree, b->loop, false, 0, false);
+        for (bool back : {false, true}) {
+            const NODE *from = back ? b->tree : a->tree, *to = back ? a->tree : b->tree;
+            const DDEP* expected = back ? backward.get() : forward.get();
+            const DDEP* told = graph.get_dep_edge(from, to, 0);
+            if (expected && told) {
+                EXPECT_EQ(told->text(), expected->text());
+                EXPECT_EQ(graph.get_dep_edge(from, to, 1), nullptr);
+                graph.remove_dep_edge(from, to, 0);
+                EXPECT_EQ(graph.get_dep_edge(from, to, 0), nullptr);
+            } else // by their types, which the graph does not always go by
+                EXPECT_EQ(told, nullptr) << p.program();
+        }
+    }
+}
 
 // ---- Where the vector is to be exact
 

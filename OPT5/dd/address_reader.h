@@ -18,7 +18,7 @@
 #include <optional>
 #include <unordered_map>
 
-constexpr int MOST_NODES = 96, MOST_DEPTH = 24, MOST_KNOWN = 32, MOST_LEVELS = 60;
+constexpr int MOST_NODES = 96, MOST_DEPTH = 24, MOST_KNOWN = 32;
 
 inline bool is_plain_integer(const TYPE* t) { return t->is_int() && !t->is_bool() && t->size <= 64; }
 inline bool same_integers(const TYPE* a, const TYPE* b) {
@@ -608,7 +608,7 @@ private:
         for (; t && f->fixed_in; t = t->left) {
             if (t->op == NAME) {
                 if (struct LOOP* counted = kept.loop_counted_by(t->u.sym))
-                    f->levels |= counted->level < MOST_LEVELS ? uint64_t(1) << counted->level : no_level(f);
+                    f->levels |= counted->level < MOST_LEVELS ? level_bit(counted->level) : no_level(f);
                 else
                     restrict_to(kept.keeps_variable(t->u.sym, point.loop), f);
                 return;

@@ -216,7 +216,7 @@ private:
         if (!is_product(t, &invariant, &count) || !term_is_fixed(f, t, fixed, pointers_are_fixed)) return false;
         struct LOOP* loop = common;
         while (loop && !(loop->VLCV && loop->VLCV->sym == count->u.sym)) loop = loop->parent;
-        if (!loop || loop->is_root() || f.levels != uint64_t(1) << loop->level) return false;
+        if (!loop || loop->is_root() || f.levels != level_bit(loop->level)) return false;
         if (side == FIRST) {
             halves.push_back({t, f, by});
             return true;

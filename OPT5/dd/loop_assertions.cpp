@@ -12,6 +12,7 @@
 
 #include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
+#include "OPT5/dd/reference_form.h"
 #include "OPT5/dd/trip.h"
 
 #include "IFILE/pragma.h"
@@ -45,6 +46,7 @@ void install_loop_callbacks() {
     loop_callbacks.givens = givens_of;
     loop_callbacks.add_given = add_given;
     loop_callbacks.is_constant_in = is_constant_in;
+    loop_callbacks.bounds_of_count = bounds_of_count;
 }
 
 // ---- Normal form of assertions

@@ -25,6 +25,10 @@ struct TERM_FACTS {
     WIDE modulus = 0, residue = 0; // above 0: the term is `residue` modulo that
 };
 
+// Of loops deeper than that nothing is known of what is computed from their counts.
+constexpr int MOST_LEVELS = 60;
+inline uint64_t level_bit(int level) { return level < MOST_LEVELS ? uint64_t(1) << level : 0; }
+
 struct REFERENCE final : DDEPNODE {
     REFERENCE() : sum(ADDRESS_BITS) {}
     ~REFERENCE() override;
@@ -82,5 +86,7 @@ void limit_trips(const struct LOOP* loop, WIDE most);
 void forget_facts_for_references(); // these limits, and the givens
 WIDE last_iteration(const struct LOOP* loop); // the greatest count of iterations at any point in it; NO_LAST: not known
 constexpr WIDE NO_LAST = FAR;
+// The counts that a variable counts the iterations of `loop`, or of a loop around it, by; false for another variable.
+bool bounds_of_count(const SYMTAB* sym, const struct LOOP* loop, int64_t* low, int64_t* high);
 // The loop around `loop`, or itself, of that level.
 struct LOOP* loop_of_level(struct LOOP* loop, int level);

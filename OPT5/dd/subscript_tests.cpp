@@ -53,6 +53,14 @@ WIDE last_iteration(const struct LOOP* loop) {
     return std::max<WIDE>(0, ends_at_tail ? most - 1 : most);
 }
 
+bool bounds_of_count(const SYMTAB* sym, const struct LOOP* loop, int64_t* low, int64_t* high) {
+    while (loop && !(loop->VLCV && loop->VLCV->sym == sym)) loop = loop->parent;
+    const WIDE last = loop && !loop->is_root() ? last_iteration(loop) : NO_LAST;
+    if (last > INT64_MAX) return false;
+    *low = 0, *high = static_cast<int64_t>(last);
+    return true;
+}
+
 namespace {
 
 constexpr int MOST_DIFFERENCES = 64, MOST_ROUNDS = 3;
@@ -295,7 +303,7 @@ private:
     }
     bool match(const TERM_FACTS& f, const TERM_FACTS& g, const LINEAR_FORM::TERM& t, int64_t k_of_other) {
         if (!is_fixed(f, t.tree) || !is_fixed(g, t.tree) || f.levels != g.levels) return false;
-        if (f.levels >> (common->level + 1)) return false; // of loops that are not around both
+        if (common->level + 1 < MOST_LEVELS && f.levels >> (common->level + 1)) return false; // of loops that are not around both
         const UNKNOWN a = unknown(t.coefficient, f), b = unknown(-WIDE(k_of_other), g);
         if (f.levels)
             pairs.push_back({a, b, f.levels});
@@ -322,7 +330,7 @@ private:
         uint64_t in_step = 0; // levels at which the iterations are the same
         for (int l = 1; l < v.count(); ++l) {
             const DISTANCES at = l == k ? d : hull_of(v.dve[static_cast<size_t>(l)]);
-            if (at.is_zero()) in_step |= uint64_t(1) << l;
+            if (at.is_zero()) in_step |= level_bit(l);
             if (!levels[static_cast<size_t>(l)].add_to(&s, at, &single)) return false;
         }
         for (const UNKNOWN& u : unknowns) add(u);
@@ -373,7 +381,7 @@ private:
     }
     bool is_concerned(int level) const {
         return levels[static_cast<size_t>(level)].is_there() ||
-               std::any_of(pairs.begin(), pairs.end(), [level](const PAIR& p) { return p.levels >> level & 1; });
+               std::any_of(pairs.begin(), pairs.end(), [level](const PAIR& p) { return p.levels & level_bit(level); });
     }
     // The level that alone is in the equation, with nothing unknown; 0 for none.
     int only_level() const {
@@ -402,13 +410,13 @@ private:
         DVE& at = v->dve[static_cast<size_t>(k)];
         const DVE before = at;
         auto goes = [&](WIDE low, WIDE high) { return !may_be(e, *v, k, {low, high}); };
-        uint64_t in_step = uint64_t(1) << k;
+        uint64_t in_step = level_bit(k);
         for (int l = 1; l < v->count(); ++l)
-            if (v->dve[static_cast<size_t>(l)].has_only_SAME_dir()) in_step |= uint64_t(1) << l;
+            if (v->dve[static_cast<size_t>(l)].has_only_SAME_dir()) in_step |= level_bit(l);
         if (has_free_terms(e, in_step)) return true;
         if (at.same && goes(0, 0)) at.same = false;
         *any |= at != before;
-        if (has_free_terms(e, in_step & ~(uint64_t(1) << k))) return at.is_dependent();
+        if (has_free_terms(e, in_step & ~level_bit(k))) return at.is_dependent();
         for (int d = -DVE::LIMIT; d <= DVE::LIMIT; ++d)
             if (d && at.has_distance(INT65(d)) && goes(d, d)) at.clr_distance(INT65(d));
         if (at.overflow_high && goes(DVE::LIMIT + 1, FAR)) at.overflow_high = false;

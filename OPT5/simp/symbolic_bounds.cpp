@@ -385,8 +385,11 @@ private:
         return range_of_type(t->type);
     }
 
-    static RANGE named(const NODE* t) {
+    RANGE named(const NODE* t) const {
         RANGE limits = range_of_type(t->type);
+        int64_t low, high;
+        if (loop && loop_callbacks.bounds_of_count && loop_callbacks.bounds_of_count(t->u.sym, loop, &low, &high))
+            return both(limits, {low, high});
         INT65 min, max;
         if (values_of_variables && t->u.sym && values_of_variables->bounds_of_variable(t->u.sym, &min, &max) &&
             t->u.sym->type->size == t->type->size && wraps_signed(t->u.sym->type) == wraps_signed(t->type))

@@ -45,6 +45,7 @@ INDEPENDENT = {
     "for (i = 0; i < n; i++, p += 2)": "p[0]=p[1]; p[3]=p[0]; p[2]=p[5]",
     "for (i = 0; i < n; i++, q -= 3)": "q[0]=q[1]; q[2]=q[0]",
     "for (i = 0; i < n; i++, o += 4)": "o[1]=o[2]; *(long *)o=*(long *)(o+2)",
+    "for (i = 0; i < 64; i++) ": "a[i/4]=a[i/8+16]; a[i&7]=a[i+8]; b[i*i]=b[4000+i]; a[i%5]=a[i+5]",
     "t = 2*k + 1; for (i = 0; i < n; i++)": "a[2*i+t]=a[2*i]; p[2*i]=p[2*i+t]",
     "for (i = 0; i < 30; i++) for (j = 0; j < 10; j++) for (l = 0; l < 2; l++)": "p[20*i+2*j+l]=p[600+l]; p[4*i+2]=p[8*j+4*l]",
 }
@@ -95,11 +96,11 @@ class Dependence(unittest.TestCase):
 
     def test_what_never_meets_has_no_edge(self):
         statements = [(loop, s.strip()) for loop, all in INDEPENDENT.items() for s in all.split(";")]
-        self.assertEqual(len(statements), 100)
+        self.assertGreaterEqual(len(statements), 100)
         told = [s for s, part in zip(statements, self.optimized(statements)) if edges(part)]
         for loop, statement in told:
             print("edge:", loop, statement)
-        self.assertLessEqual(len(told), 10)
+        self.assertLessEqual(len(told) * 10, len(statements))
 
     def test_distances_are_exact(self):
         rows = [(loop, s, want) for loop, all in EXACT.items() for s, want in all.items()]

@@ -35,11 +35,11 @@ bool reads_as_its_type(int op, const TYPE* t) { return op == EQ || op == NEQ || 
 // x % m == r, (x & m) == r for m with ones at the low end: bits that a cast takes away do not count there.
 bool modular(const NODE* left, WIDE r, RELATION* relation) {
     if (!left->right || left->right->op != ICON || !is_number(left->type)) return false;
-    const INT65 c = truncate_to_type(left->right->u.lval, left->type);
-    if (left->op == MOD && c > INT65(0))
-        relation->modulus = to_wide(c);
+    const WIDE c = range_of_tree(left->right, nullptr).min;
+    if (left->op == MOD && c > 0)
+        relation->modulus = c;
     else if (left->op == ANDB)
-        relation->modulus = WIDE(~c.value & (c.value + 1));
+        relation->modulus = ~c & (c + 1);
     if (relation->modulus < 2 || relation->modulus >= WIDE(1) << (ADDRESS_BITS - 1)) return false;
     relation->residue = (r % relation->modulus + relation->modulus) % relation->modulus;
     relation->left = left->left;

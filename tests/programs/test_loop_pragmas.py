@@ -37,14 +37,16 @@ def stated(loop, choice):
 
 
 def groups(dump):
-    """Lists of (kind, arguments) of pragmas that follow each other; flags are the optimizer's own."""
+    """Lists of (kind, arguments) of pragmas that follow each other; flags are the optimizer's own, and so may the name of
+    a loop's variable be."""
     found = [[]]
     for line in dump[dump.index("function _f:"):].splitlines():
         pragma = re.match(r" +pragma (\d+) \w+(.*)", line)
         if not pragma:
             found.append([])
         elif pragma[1] != "57":
-            found[-1].append((int(pragma[1]), pragma[2]))
+            words = re.sub(r'^\(("[^"]*"), "\w*"', r'(\1, ""', pragma[2]) if pragma[1] == "41" else pragma[2]
+            found[-1].append((int(pragma[1]), words))
     return [group for group in found if group]
 
 

@@ -456,7 +456,7 @@ protected:
         case 2: return p->compare(NEQ, p->value_of(true), number(v ? 0 : 1));
         case 3: return p->compare(v > w ? GT : v < w ? LT : EQ, p->value_of(true), p->value_of(false));
         case 4:
-            return p->compare(EQ, maketree(MOD, p->value_of(true), number(3), tp->int_t), number(v % 3));
+            return p->compare(EQ, maketree(MOD, p->value_of(true), number(one_in(2) ? 3 : -3), tp->int_t), number(v % 3));
         case 5:
             return p->compare(GE, maketree(MINUS, p->value_of(true), p->value_of(false), tp->int_t), number(v - w - pick(0, 2)));
         case 6:

@@ -56,8 +56,8 @@ uint32_t class_category(const SYMTAB* base) {
     if (base->level == 1 || base->is_automatic()) return PT_AUTOL;
     switch (base->sclass) {
     // The linker may be told to put it at a fixed address.
-    case SC_EXTDEF:
-    case SC_EXTERN: return PT_EXTERN | PT_ADCON;
+    case SC_EXTDEF: return PT_EXTERN | PT_ADCON;
+    case SC_EXTERN: return PT_EXTERN | PT_ADCON | PT_STATICG; // it may declare one that the file defines as a static
     case SC_STATIC: return base->pragma ? PT_STATICG | PT_STATICL | PT_ADCON : PT_STATICG | PT_STATICL;
     default: return PT_ALL;
     }

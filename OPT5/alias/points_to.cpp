@@ -250,4 +250,3 @@ void find_pointer_arguments(std::vector<AARG>& arguments) {
 }
 
 void propagate_PT_info() { need(fact::points_to); }
-void clear_PT_vectors() { changed(fact::every & ~fact::points_to); }

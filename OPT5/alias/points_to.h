@@ -59,7 +59,6 @@ struct PTENV {
 
 // ---- The analysis
 void propagate_PT_info(); // the fact, for the current function
-void clear_PT_vectors();  // forgets it
 
 // ---- Bindings of accesses: UMULT and STREF, also below members and wrappers
 const PTENV* PT_info_of(const NODE* lvalue); // null where nothing is known, or no longer
@@ -89,7 +88,8 @@ bool find_PT_in_formal_parms(const PTENV** out, const SYMTAB* sym);
 unsigned overall_PT_align(const PTENV* e); // 16 for null
 // The one object that the pointer lies in, or null.
 SYMTAB* single_pointsto_target_if_known(const PTENV* e);
-// A fresh tree for the value of a pointer at the block's start where that is a place in a global, or null.
+// A fresh tree, of the pointer's type, for the value of a pointer at the block's end where that is one place in a global, or
+// null.
 NODE* find_var_init_in_PT_info(SYMTAB* pointer, const BBLK* bb);
 // Whether two accesses, in any two executions in one activation, may touch. The forms are those of the accesses.
 bool UMULT_PT_targets_may_overlap(const NODE* a, const ADDRESS_FORM& x, const NODE* b, const ADDRESS_FORM& y);

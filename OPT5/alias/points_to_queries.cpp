@@ -5,6 +5,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
 
 #include <algorithm>
 #include <numeric>
@@ -77,13 +78,13 @@ SYMTAB* single_pointsto_target_if_known(const PTENV* e) {
 NODE* find_var_init_in_PT_info(SYMTAB* pointer, const BBLK* bb) {
     const PT_STORE* store = PT_store();
     if (!store || !pointer->type->is_pointer()) return nullptr;
-    const PTENV* e = store->binding(pointer, store->into[bb]);
+    const PTENV* e = store->binding(pointer, store->out_of[bb]);
     const SYMTAB* base = single_pointsto_target_if_known(e);
     if (!base || base->level != 0 || e->targets.front().stride) return nullptr;
     TYPE* type = tp->mk_ptr(base->type);
     NODE* address = maketree(UAND, mk_NAME(e->targets.front().base), nullptr, type);
     const int64_t offset = e->targets.front().offset;
-    return offset ? maketree(PLUS, address, mk_ICON(INT65(offset), type), type) : address;
+    return coerce_to_type(pointer->type->stqs(), offset ? maketree(PLUS, address, mk_ICON(INT65(offset), type), type) : address);
 }
 
 // ---- Pairs

@@ -43,8 +43,9 @@ void register_option::reset_state() {
 
 void register_option::dump() {}
 
-void process_debug_option(const char* kind, const char* list) {
+bool process_debug_option(const char* kind, const char* list) {
     const std::string prefix = std::string(kind) + ":";
+    bool all_known = true;
     for (const char* word = list; *word;) {
         const std::size_t length = std::strcspn(word, ",");
         const std::string text(word, length);
@@ -52,10 +53,14 @@ void process_debug_option(const char* kind, const char* list) {
         if (text.empty()) continue;
         const std::size_t equals = text.find('=');
         const std::string name = text.substr(0, equals);
-        if (prefix.size() + name.size() >= NAME_LIMIT) continue;
-        register_option* object = register_option::get_option(prefix + name);
-        if (!object) continue;
+        const bool fits = prefix.size() + name.size() < NAME_LIMIT;
+        register_option* object = fits ? register_option::get_option(prefix + name) : nullptr;
+        if (!object) {
+            all_known = false;
+            continue;
+        }
         object->text_m = equals == std::string::npos ? "" : text.substr(equals + 1);
         *object = equals == std::string::npos ? 1 : static_cast<int>(std::strtol(object->text_m.c_str(), nullptr, 0));
     }
+    return all_known;
 }

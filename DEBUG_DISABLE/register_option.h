@@ -28,11 +28,11 @@ public:
     static void dump();        // prints nothing
 
 private:
-    friend void process_debug_option(const char* kind, const char* list);
+    friend bool process_debug_option(const char* kind, const char* list);
     std::string name_m, text_m;
     int value = 0;
 };
 
 // Sets the switches of a comma-separated list: "name" or "name=value" with a value in C notation. `kind` is "debug",
-// "enable" or "disable". A name that no switch has is ignored.
-void process_debug_option(const char* kind, const char* list);
+// "enable" or "disable". A name that no switch has is ignored; true if there is none.
+bool process_debug_option(const char* kind, const char* list);

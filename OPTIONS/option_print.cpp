@@ -56,12 +56,20 @@ void option_obj::dump_class(class_id help_class) {
 }
 
 void option_obj::display_option_help(int, int, int) {
-    std::printf("Usage: %s [-options] filename\n\n", executable_name);
+    std::printf("Usage: %s [-options] filename [outfile]\n\n", executable_name);
     for (int c = CLASS_GENERAL; c < CLASS_COUNT; ++c) {
         if (c == CLASS_OPTIMIZER) continue; // its members stand under their subjects
         dump_class(static_cast<class_id>(c));
         if (c == CLASS_GENERAL) std::printf("  %-*s %s\n\n", HELP_COLUMN - 3, "--help, --usage, -?", "this text");
     }
+    std::printf("Files:\n"
+                "  The input is an I-file; without outfile the output has its name and the ending .opt.\n"
+                "  --print_debug writes the input's name with .odb, --gen_opt_info with .nfo.\n\n"
+                "Exit status:\n"
+                "  0 done; 1 wrong command line, wrong input, a file that cannot be opened or written, a defect;\n"
+                "  2 ended by a signal. After another status than 0 there is no output.\n\n"
+                "Environment:\n"
+                "  FORCED_OPT_PASSES  steps to run, as --opt_passes has them\n");
 }
 
 void option_obj::print() const {

@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cstdio>
 #include <climits>
 #include <cstdlib>
 
@@ -36,7 +37,9 @@ void set_aux_flags(const option_obj& options) {
 }
 
 void set_switches(const option_obj& options, int id, const char* kind) {
-    for (unsigned i = 0; i < options.getargcount(id); ++i) process_debug_option(kind, options.getstrarg(id, i));
+    for (unsigned i = 0; i < options.getargcount(id); ++i)
+        if (!process_debug_option(kind, options.getstrarg(id, i)))
+            std::fprintf(stderr, "zopt: warning: --%s:%s names a switch that there is not\n", kind, options.getstrarg(id, i));
 }
 
 void set_cpu_version(const option_obj& options) {

@@ -11,6 +11,7 @@
 #include <cerrno>
 #include <climits>
 #include <cstdlib>
+#include <cstring>
 #include <ctime>
 
 pass_manager global_pass_manager;
@@ -50,23 +51,73 @@ std::vector<int> random_order(int n) {
 
 [[noreturn]] void bad_order(const std::string& what) { fail_run("zopt: the forced order of steps: " + what); }
 
-std::vector<int> listed_order(const char* text, int n) {
-    std::vector<int> v;
-    for (const char* p = text;;) {
+// The steps of a list: numbers and names of the table, "first..last" for all from one to the other.
+class ORDER_READER {
+public:
+    explicit ORDER_READER(const char* text) : p(text) {}
+
+    std::vector<int> read() {
+        std::vector<int> order;
+        while (skip_separators()) {
+            const int first = step();
+            int last = first;
+            if (!std::strncmp(p, "..", 2)) {
+                p += 2;
+                last = step();
+            }
+            for (int i = first; i != last; i += first < last ? 1 : -1) order.push_back(i);
+            order.push_back(last);
+        }
+        return order;
+    }
+
+private:
+    bool skip_separators() {
         while (*p == ',' || std::isspace(static_cast<unsigned char>(*p))) ++p;
-        if (!*p) return v;
+        return *p != 0;
+    }
+
+    int step() {
         char* end = nullptr;
         errno = 0;
         const long index = std::strtol(p, &end, 10);
-        if (end == p) bad_order("\"" + std::string(p) + "\" is no number");
-        if (errno != 0 || index < 0 || index >= n) {
+        if (end == p) return named_step();
+        if (errno != 0 || index < 0 || index >= static_cast<long>(normal_order.size())) {
             const std::string message = "step " + std::string(p, end - p) + " of the forced order is not in the table";
             abort_optimizer(message.c_str());
         }
-        v.push_back(static_cast<int>(index));
         p = end;
+        return static_cast<int>(index);
     }
-}
+
+    // Names have spaces and commas in them: the longest one that the text begins with is meant.
+    int named_step() {
+        std::vector<int> found;
+        size_t length = 0;
+        for (const pass* step : normal_order) {
+            const size_t own = step->name.size();
+            const bool fits = own >= length && !std::strncmp(p, step->name.c_str(), own) && ends_word(p + own);
+            if (!fits) continue;
+            if (own > length) found.clear();
+            length = own;
+            found.push_back(static_cast<int>(step->serial));
+        }
+        if (found.empty()) bad_order("\"" + std::string(p) + "\" is no number, and no name of --list_passes");
+        if (found.size() > 1) {
+            std::string numbers;
+            for (int i : found) numbers += (numbers.empty() ? "" : ", ") + std::to_string(i);
+            bad_order("\"" + std::string(p, length) + "\" is the name of more than one step: " + numbers);
+        }
+        p += length;
+        return found.front();
+    }
+
+    static bool ends_word(const char* t) {
+        return !*t || *t == ',' || std::isspace(static_cast<unsigned char>(*t)) || !std::strncmp(t, "..", 2);
+    }
+
+    const char* p;
+};
 
 // What asks for an order, and in which words the report names it; null without.
 const char* forced_order(const char** source) {
@@ -87,7 +138,7 @@ void choose_order() {
     }
     const int n = static_cast<int>(normal_order.size());
     const bool is_random = std::string(text) == "random";
-    const std::vector<int> order = is_random ? random_order(n) : listed_order(text, n);
+    const std::vector<int> order = is_random ? random_order(n) : ORDER_READER(text).read();
     for (int index : order) permuted_order.push_back(normal_order[index]);
     if (!print_debug) return;
     debug_printf("Pass list, from %s, is%s: ", source, is_random ? " (random)" : "");

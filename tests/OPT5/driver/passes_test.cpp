@@ -94,6 +94,23 @@ TEST(Steps, BadForcedOrders) {
     EXPECT_EQ(r.status, 1);
     EXPECT_TRUE(contains(r.err, "\"two\" is no number")) << r.err;
     EXPECT_FALSE(w.has("b.if"));
+    for (const char* list : {"SSA_deadasg", "lcse, global", "lcse..", "no such step"}) // two of that name; a part of one
+        EXPECT_EQ(w.run({std::string("--opt_passes=") + list, "a.if", "b.if"}).status, 1) << list;
+}
+
+TEST(Steps, OrdersByNameAndRange) {
+    WORKPLACE w;
+    w.put("a.if", unit());
+    auto order_of = [&w](const char* list) {
+        const RESULT r = w.run({"--print_debug=1", std::string("--opt_passes=") + list, "a.if", "b.if"});
+        EXPECT_EQ(r.status, 0) << r.err;
+        const std::string odb = w.get("a.odb"), mark = "Pass list, from command-line option, is: ";
+        const size_t at = odb.find(mark);
+        return at == std::string::npos ? "" : odb.substr(at + mark.size(), odb.find('\n', at) - at - mark.size());
+    };
+    EXPECT_EQ(order_of("lcse"), " 77");
+    EXPECT_EQ(order_of("late fast_CP(4,1),lcp 3"), " 62 75 3");
+    EXPECT_EQ(order_of("lcp..propagate increments, 4..2"), " 75 76 77 78 4 3 2");
 }
 
 TEST(Steps, RandomOrdersArePermutations) {

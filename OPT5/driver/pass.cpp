@@ -23,7 +23,8 @@ register_option pass_debug_skip_pass("debug:skip_pass"), pass_debug_list_passes(
 
 void pass::run() {
     const bool skip = pass_debug_skip_pass > 0 && static_cast<unsigned>(pass_debug_skip_pass) == serial;
-    // A row without a frame changes blocks as it likes; an order of steps may have it between those that share a hierarchy.
+    // A row without a frame changes blocks as it likes; an order of steps may have it between those that share a
+    // hierarchy.
     if (currfuninfo && row.kind == ROW::FUNCTION && !row.frame) drop_hierarchy();
     run_row(row, "step " + std::to_string(serial), skip);
 }

@@ -1,8 +1,8 @@
 #include "OPT5/driver/pipeline.h"
 
+#include "OPT5/dd/loop.h"
 #include "OPT5/driver/driver.h"
 #include "OPT5/driver/frames.h"
-#include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
@@ -11,13 +11,14 @@
 
 #include <cctype>
 #include <cstdio>
+#include <cstdlib>
 #include <ctime>
 #include <vector>
 
 namespace {
 
-register_option pass_debug_skip("debug:skip"), pass_debug_only("debug:only"),
-    pass_debug_list_rows("debug:list_rows"), pass_debug_idle_frames("debug:idle_frames");
+register_option pass_debug_skip("debug:skip"), pass_debug_only("debug:only"), pass_debug_list_rows("debug:list_rows"),
+    pass_debug_idle_frames("debug:idle_frames"), pass_debug_rows("debug:rows");
 
 bool current_function_has_blocks() { return currfuninfo && currfuninfo->bb_list; }
 
@@ -33,7 +34,8 @@ void announce(const char* word, const ROW& row, const std::string& label) {
 
 void validate_current_function(const ROW& row, const std::string& label) {
     if (!current_function_has_blocks()) return;
-    const int errors = validate_cfg() + validate_stmts() + validate_grammar() + validate_facts() + validate_loop_hierarchy();
+    const int errors =
+        validate_cfg() + validate_stmts() + validate_grammar() + validate_facts() + validate_loop_hierarchy();
     if (errors == 0) return;
     const std::string text = label + " '" + row.name + "' left " + std::to_string(errors) + " errors";
     abort_optimizer(text.c_str());
@@ -44,8 +46,20 @@ bool has_work(const ROW& row) {
     return !row.condition || row.condition();
 }
 
+// With --debug:rows=N the first N runs of rows that may be left out take place, over all functions, and no others:
+// whoever looks for the one that breaks a program halves them. The last one is named, and their number; with N below 0
+// none takes place.
+bool is_beyond_limit(const ROW& row) {
+    static long count = 0;
+    if (!pass_debug_rows || row.kind != ROW::FUNCTION) return false;
+    if (count == 0) std::atexit([] { std::fprintf(stderr, "zopt: %ld runs of rows\n", count); });
+    if (++count == pass_debug_rows)
+        std::fprintf(stderr, "zopt: run %ld: '%s' of %s\n", count, row.name, currfunc ? currfunc->name : "the program");
+    return count > pass_debug_rows;
+}
+
 void do_work(const ROW& row, const std::string& label) {
-    if (!has_work(row)) return;
+    if (!has_work(row) || is_beyond_limit(row)) return;
     if (!row.frame || pass_debug_idle_frames || !row.frame->is_SSA_form) leave_kept_SSA_form();
     if (!row.frame || pass_debug_idle_frames) leave_kept_form();
     if (row.frame) {
@@ -140,8 +154,10 @@ void check_names(const register_option& list, const char* word) {
         for_each_row([&](const char*, const ROW& row) {
             if (switch_name(row) == name) found = &row;
         });
-        if (!found) fail_run(std::string("zopt: --debug:") + word + ": no row of the pipeline is named \"" + name + "\"");
-        if (found->kind == ROW::FIXED) fail_run(std::string("zopt: --debug:") + word + ": \"" + name + "\" runs always");
+        if (!found)
+            fail_run(std::string("zopt: --debug:") + word + ": no row of the pipeline is named \"" + name + "\"");
+        if (found->kind == ROW::FIXED)
+            fail_run(std::string("zopt: --debug:") + word + ": \"" + name + "\" runs always");
     }
 }
 

@@ -10,6 +10,8 @@ struct LOOP; // written out where it is used: an opcode has the same name
 NODE* normalize_tree(NODE* tree, NODE* statement); // a part of the statement, or all of it
 // `keep_ddnodes`: a reference with a dependence record comes out under a DDNODE, which has the record then.
 NODE* denormalize_tree(NODE* tree, bool keep_ddnodes);
+// A reference in either form as the source may have written it, a[i]; for remarks.
+std::string reference_text(const NODE* tree);
 // The integer terms of a pointer go to the right operand of the indirection it is of; what is left of it. Not null.
 NODE* partition_pointer_under_UMULT(NODE* pointer, NODE* umult);
 NODE* strip_ddep_info_from_tree(NODE* tree); // records of dependence and DDNODEs go
@@ -25,6 +27,8 @@ void split_qualified_parameter_copies();
 // Advice on pointers that nothing tells apart, of the loop and those in it (alias_advice.cpp): pragmas of the loops, and
 // text in the information file.
 void report_ambiguous_aliases(struct LOOP* loop);
+// Remarks on the counts of loops and on what keeps their iterations in order (loop_remarks.cpp).
+void tell_of_loops(struct LOOP* root);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
 bool sink_unused_definitions(struct LOOP* loop);

@@ -9,12 +9,14 @@
 // is computed in the unsigned type.
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
+#include "OPT5/dd/dd.h"
 #include "OPT5/dd/inductions.h"
 #include "OPT5/dd/merge.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -36,6 +38,7 @@ struct CANDIDATE {
     std::vector<NODE**> uses;
     int cost = 0;
     double gain = 0;         // of the uses, in an iteration
+    const PSN* psn = nullptr;
     bool is_certain = false; // it is computed whenever the loop is reached
 };
 
@@ -61,7 +64,10 @@ public:
             weight = loops.dominates_latches(bb, loop) ? 1 : 0.5;
             for (const NATURAL_LOOP* l = loops.around(bb); l && l != loop; l = l->parent) weight *= ITERATIONS;
             is_certain = bb == loop->header;
-            for (LIST* s = bb->statements; s; s = s->rest) statement(s->first);
+            for (LIST* s = bb->statements; s; s = s->rest) {
+                psn = s->psn;
+                statement(s->first);
+            }
         }
         if (found.empty()) return;
         std::stable_sort(found.begin(), found.end(),
@@ -173,6 +179,7 @@ private:
             if (found.size() == MOST_CANDIDATES) return false;
             c = &found.emplace_back();
             c->cost = cost_of(t);
+            c->psn = psn;
         }
         c->uses.push_back(place);
         c->gain += weight * c->cost;
@@ -199,6 +206,8 @@ private:
     const SYMTAB* hoist(CANDIDATE& c, BBLK* ahead) {
         NODE* value = *c.uses.front();
         TYPE* type = value->type->stqs();
+        if (remarks_are_wanted && value->op != UAND)
+            remark("hoist", c.psn, REMARK::DONE, "'" + reference_text(value) + "' is computed ahead of the loop");
         SYMTAB* variable = sym_temp(type->is_pointer() ? 'P' : 'N', -1, type, nullptr);
         if (type->is_pointer()) {
             SYMTAB* object = value->op == UAND ? pointee_name_if_known(value) : nullptr;
@@ -226,6 +235,7 @@ private:
     std::vector<CANDIDATE> found;
     int questions = 0;
     double weight = 1;
+    const PSN* psn = nullptr; // of the statement that is looked at
     bool is_certain = false;
 };
 

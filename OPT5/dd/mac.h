@@ -9,6 +9,8 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/list.h"
 
+#include <string>
+
 // acc += a*b - c*d + e becomes acc += a*b, acc -= c*d, acc += e: one statement behind the other. Whether it was split.
 // Sums of floating-point numbers are split where the program allows them to be regrouped.
 bool split_accumulations_in_stmt(LIST* cell);
@@ -27,3 +29,6 @@ SYMTAB* split_out_multiply(LIST* cell);
 
 // An accumulation whose right side holds a multiplication for the hardware, and not the accumulator.
 bool is_mac(const NODE* statement);
+bool is_mac_of_halves(const NODE* statement); // of 16-bit factors, into an integer
+// Why the sum `statement`, into its left side, of something with a multiplication is not such a one; empty if it is.
+std::string why_no_mac(const NODE* statement);

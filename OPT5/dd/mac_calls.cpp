@@ -121,6 +121,58 @@ bool is_mac(const NODE* t) {
     return product_in(const_cast<NODE**>(&t->right)).kind != NO_PRODUCT;
 }
 
+bool is_mac_of_halves(const NODE* statement) {
+    NODE* t = copy_tree(statement); // reading a product may change how it is written
+    const bool is_one = is_mac(t) && product_in(&t->right).kind == HALVES;
+    erase_tree(t);
+    return is_one;
+}
+
+// ---- Why not
+
+namespace {
+
+const NODE* multiplication_in(const NODE* t) {
+    const NODE* found = nullptr;
+    for_each_subtree(t, [&found](const NODE* n) {
+        if (n->op == MULT && n->right->op != ICON && !found) found = n;
+    });
+    return found;
+}
+
+std::string why_no_accumulator(const NODE* sum) {
+    if (sum->op != NAME) return "the sum is in memory: keep it in a local variable during the loop";
+    if (!is_a_likely_zelkova_register(sum->u.sym))
+        return "the sum is no local variable, or its address is taken: keep it in a local one during the loop";
+    if (is_a_likely_zelkova_accumulator(sum, false)) return "";
+    return std::string("the sum is of type ") + sum->type->stqs()->printstr() + ": make it a long";
+}
+
+std::string why_no_product(const NODE* m) {
+    if (!m) return "it multiplies by a constant";
+    if (m->type->is_float()) return "there is no unit for its floating-point type: see --float_support";
+    const NODE *a = m->left, *b = m->right;
+    while (a->op == SCONV) a = a->left;
+    while (b->op == SCONV) b = b->left;
+    if (!a->type->is_signed() || !b->type->is_signed()) return "a factor is unsigned: the hardware's are signed";
+    if (a->op != UMULT && b->op != UMULT) return "no factor is read from memory where it is multiplied";
+    if (m->type->size == 16) return "in C the product of two int has 16 bits, the hardware's has 32: write (long)x * y";
+    return "the hardware multiplies two int, or two long, and shifts the product right by at most 6";
+}
+
+} // namespace
+
+std::string why_no_mac(const NODE* statement) {
+    NODE* t = copy_tree(statement);
+    std::string why = why_no_accumulator(t->left);
+    if (why.empty() && !is_mac(t)) {
+        why = why_no_product(multiplication_in(t->right));
+        if (t->op == PLUSASG && sym_appears_in_tree(t->left->u.sym, t->right)) why = "what is added uses the sum itself";
+    }
+    erase_tree(t);
+    return why;
+}
+
 // ---- Splitting
 
 namespace {

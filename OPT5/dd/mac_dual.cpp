@@ -20,6 +20,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
@@ -60,7 +61,11 @@ NODE* sum_of(const STEP& step, INT65 times) {
 class DUAL_LOOP {
 public:
     explicit DUAL_LOOP(struct LOOP* of) : loop(of), bb(of->head) {}
-    bool convert() { return is_suitable() && (convert_pair() || convert_doubled()); }
+    bool convert() {
+        const bool is_converted = is_suitable() && (convert_pair() || convert_doubled());
+        if (remarks_are_wanted && !is_converted) tell();
+        return is_converted;
+    }
 
 private:
     bool is_suitable();
@@ -71,6 +76,8 @@ private:
     const NODE* only_mac(std::vector<STEP>& steps) const;
     LIST* two_iterations(const NODE* mac, const std::vector<STEP>& steps, SYMTAB* temp) const;
     void use(LIST* list);
+    void tell();
+    std::string why_not(const NODE* mac);
 
     struct LOOP* const loop;
     BBLK* const bb;
@@ -238,6 +245,32 @@ bool DUAL_LOOP::convert_doubled() {
     insert_before(&exit->statements, add, psn);
     update_pragmas_for_loop(loop, 2);
     return true;
+}
+
+// ---- What the programmer is told
+
+std::string DUAL_LOOP::why_not(const NODE* mac) {
+    if (loop_has_subloops(loop) || !is_suitable()) return "the loop has more than one block: take if, ?: and calls out of it";
+    std::vector<STEP> steps;
+    if (loop->has(LOOP_early_exit) || !only_mac(steps)) return "the loop does more than add one product and step by one element";
+    if (!loop->tripFactor || loop->tripFactor->op != ICON || !(loop->tripFactor->u.lval % INT65(2)).is_zero())
+        return "its number of iterations is not known to be even: a constant, or #pragma MUST_ITERATE(2, , 2)";
+    const NODE* unaligned = nullptr;
+    for_each_subtree(mac->right, [&](const NODE* n) {
+        if (n->op == UMULT && !unaligned && !is_aligned_at_entry(n)) unaligned = n;
+    });
+    if (unaligned)
+        return "'" + reference_text(unaligned) + "' is not known to begin on a 32-bit boundary: #pragma DATA_ALIGN(array, 2)";
+    return "both factors must be elements of int that move up by one an iteration";
+}
+
+void DUAL_LOOP::tell() {
+    if (loop->is_root()) return;
+    for (const BBLK* b : loop->contents)
+        for (const LIST* s = b->statements; b->loop == loop && s; s = s->rest)
+            if (is_mac_of_halves(s->first))
+                return remark("dual multiply-accumulate", s->psn, REMARK::MISSED,
+                              "one product an iteration, not two: " + why_not(s->first));
 }
 
 } // namespace

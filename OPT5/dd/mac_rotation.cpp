@@ -15,6 +15,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
@@ -23,6 +24,8 @@
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/accumulators.h"
 
+#include <algorithm>
+#include <string>
 #include <utility>
 #include <vector>
 
@@ -153,6 +156,67 @@ void read_square_from_memory(BBLK* bb) {
     }
 }
 
+// ---- What the programmer is told
+
+constexpr char PASS[] = "multiply-accumulate";
+
+bool is_in_cycle(BBLK* bb) {
+    std::vector<const BBLK*> waiting{bb}, seen;
+    while (!waiting.empty()) {
+        const BBLK* at = waiting.back();
+        waiting.pop_back();
+        for (const EDGE* e = at->successors; e; e = e->rest) {
+            if (e->first == bb) return true;
+            if (std::find(seen.begin(), seen.end(), e->first) != seen.end()) continue;
+            seen.push_back(e->first);
+            waiting.push_back(e->first);
+        }
+    }
+    return false;
+}
+
+std::string why_not_rotated(BBLK* bb, const LIST* cell, int products) {
+    std::string why = why_no_mac(cell->first);
+    if (!why.empty()) return why;
+    if (ROTATION r; !find_rotation(bb, &r)) return "the loop has more than one block: take if, ?: and calls out of it";
+    if (!multiplies_once(bb))
+        return "there are " + std::to_string(products) + " multiplications an iteration and one multiplier: make a loop of each sum";
+    if (!may_be_late(bb, cell)) return "the loop reads or changes the sum elsewhere";
+    return "the hardware has no instruction for this product";
+}
+
+bool multiplies_loaded(const NODE* t) {
+    const auto is_loaded = [](const NODE* n) { return n->op == UMULT; };
+    return any_subtree(t, [&](const NODE* n) {
+        return n->op == MULT && n->right->op != ICON && (any_subtree(n->left, is_loaded) || any_subtree(n->right, is_loaded));
+    });
+}
+
+void tell_of_block(BBLK* bb) {
+    int products = 0;
+    const LIST* first = nullptr;
+    bool is_told = false;
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        const int count = count_multiplies(s->first, false);
+        products += count;
+        if (!first && multiplies_loaded(s->first)) first = s;
+        if (s->first->op != MCALL) continue;
+        const std::string name = s->first->u.name;
+        if (name.compare(0, 11, "__parallel_") != 0 && name != "__dmac") continue;
+        remark(PASS, s->psn, REMARK::DONE, "one instruction adds and multiplies: " + name);
+        is_told = true;
+    }
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        if (!is_sum_into_target(s->first) || !count_multiplies(s->first->right, false)) continue;
+        remark(PASS, s->psn, REMARK::MISSED, "adds apart from multiplying: " + why_not_rotated(bb, s, products));
+        is_told = true;
+    }
+    if (!is_told && first)
+        remark(PASS, first->psn, REMARK::NOTE, std::to_string(products) + " multiplications an iteration, none of them added to a sum");
+}
+
+// ---- The rotation
+
 // What added to, or taken from, any number leaves it as it is.
 NODE* neutral(const NODE* accumulation) {
     TYPE* type = accumulation->left->type->stqs();
@@ -238,6 +302,9 @@ bool ROTATOR::run() {
         if (!find_rotation(bb, &r) || !multiplies_once(bb)) continue;
         if (!pass_disable_simple_rotation && rotate(r)) continue;
     }
+    if (remarks_are_wanted)
+        for (BBLK* bb : blocks)
+            if (is_in_cycle(bb)) tell_of_block(bb);
     if (has_new_temps) sym_split(currfuninfo);
     changed(has_new_blocks ? fact::none : fact::graph);
     return has_new_temps;

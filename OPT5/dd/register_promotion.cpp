@@ -12,6 +12,8 @@
 // change, and, behind a pointer, before a call that may not return: `if (p) s += *p` reads nothing ahead of the test.
 #include "OPT5/dd/register_promotion.h"
 
+#include "OPT5/dd/dd.h"
+
 #include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/facts.h"
@@ -19,6 +21,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -468,6 +471,37 @@ double LOAD_PROMOTER::gain_of(size_t k, const INSERTIONS& inserted, const VALUE_
     return gone - assigned;
 }
 
+// ---- What the programmer is told, of loads in loops
+
+// Another statement of the loop that may write to the place: not one that makes it another place.
+const LIST* what_may_change(const CANDIDATE& c, const EVENT& use, const MOTION_GRAPH& graph) {
+    const NATURAL_LOOPS& loops = *currfuninfo->loops;
+    const NATURAL_LOOP* loop = loops.around(graph.blocks[use.block]);
+    for (const EVENT& e : c.events) {
+        if (e.kind != EVENT::KILL || !e.cell || !loop || !loops.contains(loop, graph.blocks[e.block])) continue;
+        bool is_other_place = false;
+        for_each_written_name(below_SSA(e.cell->first), [&](const NODE* name, const NODE*) {
+            is_other_place |= name->u.sym == c.variable->pointer;
+        });
+        if (is_other_place) return nullptr;
+        if (e.cell->psn && e.cell != use.cell) return e.cell;
+    }
+    return nullptr;
+}
+
+void tell_of_loads(const CANDIDATE& c, const MOTION_GRAPH& graph) {
+    for (const EVENT& e : c.events) {
+        if (e.kind != EVENT::USE || !e.cell || !e.link || !currfuninfo->loops->around(graph.blocks[e.block])) continue;
+        const std::string place = "'" + reference_text(c.reference) + "'";
+        if (e.is_deleted && c.temp)
+            remark("promote", e.cell->psn, REMARK::DONE, place + " is read from a register");
+        else if (const LIST* s = e.is_saved ? nullptr : what_may_change(c, e, graph))
+            remark("promote", e.cell->psn, REMARK::MISSED,
+                   place + " is read from memory in each iteration, since line " + std::to_string(s->psn->line) +
+                       " may write to it: copy it into a local variable ahead of the loop, or declare pointers restrict");
+    }
+}
+
 // ---- The trees
 
 void LOAD_PROMOTER::tell(const char* what, CANDIDATE& c, const EVENT& e) {
@@ -643,6 +677,8 @@ bool promote_loads(const std::vector<std::unique_ptr<CANDIDATE>>& all, PROMOTION
         blocks += graph.blocks.size();
         promoter.run({candidates.begin() + static_cast<long>(i), end}, blocks <= MOST_BLOCKS_OF_BATCHES);
     }
+    if (remarks_are_wanted)
+        for (const CANDIDATE* c : candidates) tell_of_loads(*c, graph);
     return promoter.finish();
 }
 

@@ -12,6 +12,7 @@
 // loop within, which may not return: `for (...) if (d) s += n / d` stays. What is not certain to be evaluated may be
 // computed though nobody asked: its signed operations wrap.
 #include "OPT5/dd/ssa.h"
+#include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/effects.h"
 #include "OPT5/dd/loop.h"
@@ -19,6 +20,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
@@ -434,7 +436,13 @@ private:
 
     // ---- The move
 
+    static void tell(const RCX& rcx) {
+        remark("hoist", rcx.instances.front().cell->psn, REMARK::DONE,
+               "'" + reference_text(rcx.tree()) + "' is computed ahead of the loop");
+    }
+
     void hoist(RCX& rcx) {
+        if (remarks_are_wanted) tell(rcx);
         NODE* value = copy_tree(rcx.tree());
         TYPE* type = value->type->stqs();
         SYMTAB* temp = sym_temp('H', -1, type, nullptr);

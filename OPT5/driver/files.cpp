@@ -7,6 +7,7 @@
 #include "OPT5/io/read.h"
 #include "OPT5/ipa/inline.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "TYPES/type.h"
 
 #include <cerrno>
@@ -17,8 +18,10 @@
 namespace {
 
 register_option pass_debug_help("debug:help");
+register_option pass_debug_remarks("debug:remarks"); // the file, JSON lines
 
-std::string info_name, debug_name;
+std::string info_name, debug_name, remarks_name;
+FILE* remarks_file = nullptr;
 FILE* output_stream = nullptr; // until the I_FILE takes it over
 std::string real_output_name;  // the file itself, should the name be a link to it
 
@@ -85,6 +88,19 @@ void open_info_file() {
     print_toolversion(finfo);
 }
 
+void open_remarks_file() {
+    remarks_are_wanted = write_opt_info || pass_debug_remarks;
+    remarks_name = pass_debug_remarks.text();
+    if (remarks_name.empty()) return;
+    remarks_are_wanted = true;
+    refuse_same_file(remarks_name, i_file_name, "input");
+    refuse_same_file(remarks_name, o_file_name, "output");
+    refuse_same_file(remarks_name, info_name, "info");
+    refuse_same_file(remarks_name, debug_name, "debug");
+    remarks_file = std::fopen(remarks_name.c_str(), "w");
+    if (!remarks_file) cannot_open("\n>> Cannot Open Remarks File, %s : %s, Aborting\n", remarks_name);
+}
+
 void open_output() {
     refuse_same_file(o_file_name, info_name, "info");
     refuse_same_file(o_file_name, debug_name, "debug");
@@ -134,6 +150,7 @@ void open_files(int argc, char** argv) {
         open_debug_file(1, nullptr, nullptr);
         print_debug = static_cast<int>(file_options->getnumarg(option_obj::OO_print_debug));
     }
+    open_remarks_file();
     init_proc_integration();
     open_output();
     warn_of_volatile_variables();
@@ -200,6 +217,13 @@ bool finish_text_file(FILE*& file, const char* last_line) {
     return std::fclose(f) == 0 && !failed;
 }
 
+void write_remarks() {
+    if (remarks_file) write_remarks_as_JSON(remarks_file);
+    if (!finfo) return;
+    info_printf("\n== REMARKS ==\n\n");
+    write_remarks_as_text(finfo, write_opt_info >= 2);
+}
+
 } // namespace
 
 void close_files() {
@@ -212,9 +236,11 @@ void close_files() {
     I_FILE::if_close(i_file, true, false);
     i_file = nullptr;
     const bool debug_good = finish_text_file(fdebug, "\n== END OF DEBUG OUTPUT==\n");
+    write_remarks();
     const bool info_good = finish_text_file(finfo, "\n== END OF INFO OUTPUT==\n");
-    if (!output_failed && debug_good && info_good) return;
-    const std::string& name = output_failed ? o_file_name : debug_good ? info_name : debug_name;
+    const bool remarks_good = finish_text_file(remarks_file, "");
+    if (!output_failed && debug_good && info_good && remarks_good) return;
+    const std::string& name = output_failed ? o_file_name : !debug_good ? debug_name : !info_good ? info_name : remarks_name;
     remove_output();
     std::fprintf(stderr, "zopt: %s: cannot write: %s\n", name.c_str(), std::strerror(reason ? reason : EIO));
     std::exit(1);

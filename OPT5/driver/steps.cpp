@@ -186,6 +186,11 @@ void collapse_loops() {
     wrapup_dependence_analysis(false);
 }
 
+void advise() {
+    report_ambiguous_aliases(root());
+    tell_of_loops(root());
+}
+
 void circular_addressing() {
     sr_circular_addressing_in_loop(root());
     sr_DIV_and_MOD_in_loop(root(), true);
@@ -274,7 +279,7 @@ const ROW steps[] = {
     /* 51 */ {L, "explode_arrays", nullptr, L2, explode_local_arrays, none, none},
     /* 52 */ {L, "unroll_for_SP", &D_with_dependence, L2, [] { unroll_loops_for_SP(root()); }, none, none},
     /* 53 */ {L, "simplify_useless_loop_clones", nullptr, always, nothing, none, none},
-    /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, [] { report_ambiguous_aliases(root()); }, none, graph | alias_marks},
+    /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, advise, none, graph | alias_marks},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {F, "value_propagation", nullptr, L2_without_loops, value_propagation, alias_marks, graph},
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},

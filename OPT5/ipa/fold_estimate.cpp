@@ -5,6 +5,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
@@ -22,6 +23,7 @@ public:
         currfuninfo = &f;
         currfunc = f.symbol;
         print_debug = write_opt_info = 0;
+        remarks_are_wanted = false;
     }
     ~SCRATCH() {
         erase_all();
@@ -29,6 +31,7 @@ public:
         currfunc = symbol;
         print_debug = debug;
         write_opt_info = info;
+        remarks_are_wanted = remarks;
     }
     SCRATCH(const SCRATCH&) = delete;
     SCRATCH& operator=(const SCRATCH&) = delete;
@@ -39,6 +42,7 @@ private:
     FUNINFO* const function = currfuninfo;
     SYMTAB* const symbol = currfunc;
     const int debug = print_debug, info = write_opt_info;
+    const bool remarks = remarks_are_wanted;
 };
 
 int count_nodes() {

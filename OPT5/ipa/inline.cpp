@@ -8,6 +8,7 @@
 #include "OPT5/ipa/progana.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "UTIL/abort.h"
 
 #include <cstdarg>
@@ -100,16 +101,19 @@ bool may_be_suppressed(FUNINFO* f) {
 }
 
 void consider(CALLSITE* site, SITES* sites) {
-    const char* reason;
+    const char*& reason = site->refusal;
     inline_commentary("[considering:  %s]\n", site->description().c_str());
     if (!is_inline_candidate(*site, &reason))
         inline_commentary("[%s is not a candidate (%s)]\n", site->description().c_str(), reason);
     else if (!is_inlineable(*site, &reason))
         inline_commentary("[%s is not inlineable (%s)]\n", site->description().c_str(), reason);
-    else if (!site->inlineable)
+    else if (!site->inlineable) {
+        reason = "not inlineable";
         inline_commentary("[%s is not inlineable]\n", site->description().c_str());
-    else
+    } else {
+        reason = nullptr;
         sites->push_back(site);
+    }
 }
 
 void collect(INLINE_FILE& file, SITES* sites) {
@@ -127,6 +131,44 @@ void collect(INLINE_FILE& file, SITES* sites) {
     }
     currfuninfo = before;
     currfunc = before_symbol;
+}
+
+// ---- What the programmer is told
+
+const char* help_for(const CALLSITE& site, const std::string& reason) {
+    if (!site.callee) return "it is called through a pointer that may point to several functions";
+    if (!function_is_defined(site.callee)) return nullptr; // of a library: nothing to be done here
+    if (reason == "--disable_inlining") return "--disable_inlining was given";
+    if (reason == "no inlining conditions apply")
+        return opt_level() < 3 ? "declare it inline, or optimize at level 3"
+                               : "it is larger than --auto_inline allows: declare it inline, or #pragma FUNC_ALWAYS_INLINE";
+    if (reason == "cannot-inline or never-returns") return "it never returns, #pragma FUNC_CANNOT_INLINE, or its body cannot be copied";
+    if (reason == "fun-follows-call auto-inline") return "it calls its caller, or itself: declare it inline";
+    if (reason == "varargs or body problems") return "it takes a variable number of arguments, or has no body to copy";
+    return "NOINLINE, recursion, or arguments that its parameters do not take";
+}
+
+// A name of C stands behind an underscore.
+std::string source_name(const std::string& name) { return name.compare(0, 1, "_") == 0 ? name.substr(1) : name; }
+
+void tell(const CALLSITE& site) {
+    const std::string name = site.callee ? source_name(site.callee->name) + "()" : "the function";
+    if (site.is_accepted)
+        return remark("inline", site.psn, REMARK::DONE, name + " is expanded here");
+    if (!site.refusal)
+        return remark("inline", site.psn, REMARK::MISSED,
+                      name + " is not expanded: the file would grow too large; declare it inline, or #pragma FORCEINLINE");
+    if (const char* help = help_for(site, site.refusal))
+        remark("inline", site.psn, REMARK::MISSED, name + " is not expanded: " + help);
+}
+
+void tell_of_sites(const INLINE_FILE& file) {
+    FUNINFO* const before = currfuninfo;
+    for (const auto& site : file.owned) {
+        currfuninfo = site->caller;
+        tell(*site);
+    }
+    currfuninfo = before;
 }
 
 // A site that is forced with the calls below it needs the bodies of all of those.
@@ -169,4 +211,5 @@ void auto_inline_call_sites() {
               {inliner->static_limit, 0, static_cast<uint32_t>(inline_loops_limit), static_cast<uint32_t>(inline_blocks_limit)});
     inliner->auto_inlining_passes(file, sites);
     save_bodies_below(file);
+    if (remarks_are_wanted) tell_of_sites(file);
 }

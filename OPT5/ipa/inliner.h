@@ -37,6 +37,7 @@ struct CALLSITE {
     NODE* args = nullptr; // a copy, owned
     bool forced = false, forced_deep = false;
     bool is_accepted = false;
+    const char* refusal = nullptr; // why it is no candidate; null of one
 
     CALLSITE() = default;
     CALLSITE(const CALLSITE&) = delete;

@@ -1,5 +1,7 @@
 """tools/zrun: its statuses, what it shows and what it keeps. ZOPT, ICRUN, ICDUMP and ICPARSE name the programs."""
+import json
 import os
+import re
 import subprocess
 import tempfile
 import unittest
@@ -25,6 +27,29 @@ int f(int n, int m) { int i, j, s = 0;
         for (j = 0; j < m; j++) { put_i16(s); s += i * j; } }
     return s; }
 int main(void) { put_i16(f(4, 3)); return 0; }
+"""
+
+
+# Behind each line the remarks to be found under it.
+TOLD = """#include <zrun.h>
+int x[32], y[32]; long s;
+static int pair(int *p) { return p[0] + p[1]; }
+int f(int n) { int i; long a = 0, b = 0;
+    for (i = 0; i < 32; i++)  // done    loops: one branch closes it: 32 iterations
+        a += (long)x[i] * y[i];  // done    multiply.*__parallel_mpy_add; missed  dual.*32-bit boundary
+    for (i = 0; i < n; i++)  // done    loops: one branch closes it: n iterations
+        b += x[i] * y[i];  // missed  multiply-accumulate: .*write \\(long\\)x \\* y
+    for (i = 0; i < n; i++)
+        { if (x[i] > 3) b += (long)x[i] * y[i]; }  // missed  multiply-accumulate: .*more than one block
+    while (x[n] != 7) n -= x[n & 7];  // missed  loops: .*no variable counts
+    return (int)(a + b); }
+void g(int *p, int *q, int n) { int i;
+    for (i = 0; i < n; i++) p[i] = q[i] + 1;  // missed  dependence: .*restrict
+    for (i = 0; i < 31; i++)
+        x[i + 1] = x[i] + i;  // note    dependence: .*'x\\[i \\+ 1\\]' .*'x\\[i\\]' .*1 apart
+    for (i = 0; i < 32; i++) y[i] = 3; }  // done    dependence: no access
+int main(void) { x[0] = 1; x[5] = 7; g(x, y, 5);
+    put_i16(f(5)); put_i16(pair(x)); return 0; }  // done    inline: pair\\(\\) is expanded here; missed  inline: f\\(\\)
 """
 
 
@@ -60,6 +85,32 @@ class Zrun(unittest.TestCase):
         self.assertRegex(done.stdout, r"\nloop 1 of line 3: .*\n(    .*\n)*loop 2 of line 5: ")
         dot = subprocess.run([os.environ["ICDUMP"], "--dot", self.folder / "p.opt.if"], stdout=subprocess.PIPE, text=True).stdout
         self.assertRegex(dot, r"(?s)cluster_\d_1 \{\s*label=\"loop 1: [^}]*cluster_\d_2 \{\s*label=\"loop 2: [^}]*\}[^}]*\}")
+
+    def test_remarks(self):
+        done = self.zrun("--opt_level=3", "--unified_memory", "--remarks", source=TOLD)
+        self.assertEqual(done.returncode, 0, done.stderr)
+        told = done.stdout.split("\n\n")[0]
+        for number, line in enumerate(TOLD.splitlines(), 1):
+            *_, wanted = line.partition("// ")
+            under = re.search(rf"^p.c:{number}: .*\n((?:    .*\n?)*)", told, re.M)
+            for text in filter(None, wanted.split("; ")):
+                self.assertRegex(under[1] if under else "", f"(?m)^    {text}")
+        self.assertEqual(told.count("pair() is expanded here"), 1)
+
+    def test_remarks_change_nothing(self):
+        self.zrun("--keep", self.folder, source=TOLD)
+        written = set()
+        for name in "remarks", "remarkz", "remarks":
+            out, told = self.folder / "out.if", self.folder / "told"
+            subprocess.run([os.environ["ZOPT"], "-o3", f"--debug:{name}={told}", self.folder / "p.if", out], check=True,
+                           stdout=subprocess.DEVNULL)
+            written.add(out.read_bytes().replace(b"remarkz", b"remarks"))
+        self.assertEqual(len(written), 1)
+        for remark in map(json.loads, told.read_text().splitlines()):
+            self.assertEqual(set(remark), {"file", "line", "column", "function", "pass", "kind", "text"})
+            self.assertIn(remark["kind"], {"done", "missed", "note"})
+        over = subprocess.run([os.environ["ZOPT"], f"--debug:remarks={out}", self.folder / "p.if", out], stderr=subprocess.PIPE)
+        self.assertEqual(over.returncode, 1, over.stderr)
 
     def test_different(self):
         self.assertEqual(self.zrun("--keep", self.folder, source=PROGRAM.replace("41", "42")).returncode, 0)

@@ -1,0 +1,170 @@
+// What the programmer is told of each loop: how often it runs, and which accesses to memory keep its iterations in order.
+//
+// Needs: the loop hierarchy with its counts, dependence analysis that is active. Leaves: everything.
+#include "OPT5/dd/dd.h"
+
+#include "OPT5/alias/alias.h"
+#include "OPT5/dd/dependence.h"
+#include "OPT5/dd/loop.h"
+#include "OPT5/dd/ssa.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/remark.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/ir/walks.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <vector>
+
+namespace {
+
+constexpr size_t MOST_REFERENCES = 40, MOST_TOLD = 3;
+
+// A global has an underscore ahead of its name in C.
+std::string variable_text(const NODE* name) {
+    const std::string text = tree_to_infix(name);
+    return name->u.sym->level == 0 && text.compare(0, 1, "_") == 0 ? text.substr(1) : text;
+}
+
+// Of *address.
+std::string text_behind(const NODE* address) {
+    while (address->op == PCONV) address = address->left;
+    const auto object = [](const NODE* t) { return t->op == UAND && t->left->op == NAME ? t->left : t->op == NAME ? t : nullptr; };
+    const bool is_sum = address->op == PLUS;
+    const NODE* base = object(is_sum ? address->left : address);
+    if (!base) return "";
+    if (is_sum) return variable_text(base) + "[" + tree_to_infix(address->right) + "]";
+    return address->op == UAND ? variable_text(base) + "[0]" : "*" + variable_text(base);
+}
+
+PSN place_of(const struct LOOP* loop) {
+    const SOURCE_PLACE& start = loop->sourceStart;
+    PSN place{nullptr, 0, 0};
+    for (const LIST* s = loop->head->statements; s && place.line == 0; s = s->rest)
+        if (s->psn) place = *s->psn;
+    if (start.line) place = {start.file.empty() ? place.file : start.file.c_str(), start.line, start.column};
+    return place;
+}
+
+// ---- How often it runs
+
+std::string number(const NODE* icon, const char* otherwise) {
+    return icon && icon->op == ICON ? std::to_string(icon->u.lval.value) : otherwise;
+}
+
+std::string count_of(const struct LOOP* loop) {
+    if (loop->trips && loop->trips->op == ICON) return number(loop->trips, "") + " iterations";
+    const std::string least = number(loop->minTrips, "0"), most = number(loop->maxTrips, ""),
+                      factor = number(loop->tripFactor, "1");
+    std::string text = (loop->trips ? reference_text(loop->trips) + " iterations, " : "") + least;
+    text += most.empty() ? " or more" : least == most ? "" : " to " + most;
+    if (!loop->trips) text += " iterations";
+    return factor == "1" ? text : text + ", a multiple of " + factor;
+}
+
+const char* why_not_counted(const struct LOOP* loop) {
+    if (loop->has(LOOP_early_exit)) return "it is left from elsewhere than its end, too: test one counter in one place, without break, return and goto";
+    const LOOPIV* counter = loop->LCV;
+    if (!counter)
+        return "no variable counts its iterations: test a variable that changes by a constant, once an iteration, "
+               "against a limit that the loop does not change";
+    if (!counter->init || !counter->incrtree)
+        return "its counter begins or steps with what is not known: write for (i = 0; i < n; i++), or use #pragma MUST_ITERATE";
+    return "its counter may wrap, or pass the limit: count in int with < or >, or use #pragma MUST_ITERATE";
+}
+
+void tell_of_count(const struct LOOP* loop, const PSN& place) {
+    const bool is_counted = loop->trips && !loop->has(LOOP_early_exit), is_closed = loop->is_bottom_tested();
+    const char* const shape = is_closed ? "one branch closes it: " : "tested at its top: ";
+    if (is_counted) return remark("loops", &place, is_closed ? REMARK::DONE : REMARK::NOTE, shape + count_of(loop));
+    remark("loops", &place, REMARK::MISSED,
+           shape + std::string("its number of iterations is not known ahead of it: ") + why_not_counted(loop));
+}
+
+// ---- What keeps its iterations in order
+
+struct REFERENCE {
+    const NODE* lvalue;
+    const LIST* statement;
+    bool is_write;
+};
+
+std::vector<REFERENCE> references_of(const struct LOOP* loop) {
+    std::vector<REFERENCE> found;
+    for (const BBLK* bb : loop->contents)
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            const NODE* t = s->first;
+            if (t->op == NASSERT || t->op == ASSERT || t->op == PPRAGMA) continue;
+            const NODE* target = writes_left_operand(t->op) ? without_members(t->left) : nullptr;
+            for_each_subtree(t, [&](const NODE* n) {
+                if (n->op == UMULT) found.push_back({n, s, n == target});
+            });
+        }
+    return found;
+}
+
+bool have_one_base(const NODE* a, const NODE* b) {
+    const NODE *x = address_expr_base(a->left), *y = address_expr_base(b->left);
+    return x && y && trees_are_congruent(x, y, false);
+}
+
+bool is_between_iterations(const DVE& d) { return d.has_FWD_dirs() || d.has_BWD_dirs(); }
+
+std::string place_in_text(const REFERENCE& r) {
+    const std::string text = "'" + reference_text(r.lvalue) + "'";
+    return r.statement->psn ? text + " of line " + std::to_string(r.statement->psn->line) : text;
+}
+
+void tell_of_pair(const REFERENCE& store, const REFERENCE& other, const DVE& d) {
+    const int distance = d.has_exact_distance() ? std::abs(d.exact_distance()) : 0;
+    const char* const help = have_one_base(store.lvalue, other.lvalue) ? ": nothing tells their subscripts apart"
+                                                                       : ": if not, declare pointers restrict";
+    std::string text = "iterations stay in order: " + place_in_text(store) + " and " + place_in_text(other);
+    text += distance ? " are the same place in iterations " + std::to_string(distance) + " apart"
+                     : std::string(" may be the same place") + help;
+    remark("dependence", store.statement->psn, distance ? REMARK::NOTE : REMARK::MISSED, text);
+}
+
+void tell_of_dependences(struct LOOP* loop, const PSN& place) {
+    const std::vector<REFERENCE> references = references_of(loop);
+    const auto is_store = [](const REFERENCE& r) { return r.is_write; };
+    if (references.size() > MOST_REFERENCES || std::none_of(references.begin(), references.end(), is_store)) return;
+    if (loop->has(LOOP_has_call))
+        return remark("dependence", &place, REMARK::MISSED, "iterations stay in order: there is a call; see what is said of its inlining");
+    size_t told = 0;
+    for (size_t i = 0; i < references.size(); ++i)
+        for (size_t j = i; j < references.size() && told < MOST_TOLD; ++j) {
+            const REFERENCE &a = references[i], &b = references[j];
+            if (!a.is_write && !b.is_write) continue;
+            DVE d;
+            compute_distances_for_loop(&d, a.lvalue, b.lvalue, loop);
+            if (!is_between_iterations(d)) continue;
+            tell_of_pair(a.is_write ? a : b, a.is_write ? b : a, d);
+            ++told;
+        }
+    if (!told) remark("dependence", &place, REMARK::DONE, "no access to memory keeps its iterations in order");
+}
+
+} // namespace
+
+std::string reference_text(const NODE* tree) {
+    NODE* t = denormalize_tree(copy_dd_tree_removing_SSA_operators(tree), false);
+    std::string text = t->op == UMULT ? text_behind(t->left) : t->op == NAME ? variable_text(t) : "";
+    if (text.empty()) text = tree_to_infix(t);
+    erase_tree(t);
+    return text;
+}
+
+void tell_of_loops(struct LOOP* root) {
+    if (!root || !remarks_are_wanted) return;
+    if (root->irreducible) {
+        const PSN place = place_of(root);
+        return remark("loops", &place, REMARK::MISSED, "no loop is known here: a goto leads into the middle of one");
+    }
+    for (struct LOOP* loop : loops_outer_first(root)) {
+        if (loop->is_root()) continue;
+        const PSN place = place_of(loop);
+        tell_of_count(loop, place);
+        if (!loop_has_subloops(loop)) tell_of_dependences(loop, place);
+    }
+}

@@ -110,19 +110,10 @@ bool DUAL_LOOP::all_are_aligned(const NODE* t) const {
     return !any_subtree(t, [this](const NODE* n) { return n->op == UMULT && !is_aligned_at_entry(n); });
 }
 
-void erase_list(LIST* list) {
-    while (list) {
-        LIST* rest = list->rest;
-        if (list->first) erase_tree(list->first);
-        delete list;
-        list = rest;
-    }
-}
-
 void DUAL_LOOP::use(LIST* list) {
     LIST* old = bb->statements;
     set_statements(bb, list);
-    erase_list(old);
+    erase_tree_list(old);
 }
 
 // The variables that move by whole words: what is aligned at first stays so.
@@ -163,7 +154,7 @@ bool DUAL_LOOP::convert_pair() {
         use(copy);
         return true;
     }
-    erase_list(copy);
+    erase_tree_list(copy);
     return false;
 }
 
@@ -217,7 +208,7 @@ LIST* DUAL_LOOP::two_iterations(const NODE* mac, const std::vector<STEP>& steps,
     NODE* second = list->rest->first;
     second->left = subst_sym_for_sym_in_tree(second->left->u.sym, temp, second->left);
     if (!conversion_to_s32xs32_DMAC_succeeds(list)) {
-        erase_list(list);
+        erase_tree_list(list);
         return nullptr;
     }
     LIST* at = list;

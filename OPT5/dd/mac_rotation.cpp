@@ -230,15 +230,6 @@ LIST* copy_of_statement(const LIST* cell) {
     return copy;
 }
 
-void erase_list(LIST* list) {
-    while (list) {
-        LIST* rest = list->rest;
-        if (list->first) erase_tree(list->first);
-        delete list;
-        list = rest;
-    }
-}
-
 class ROTATOR {
 public:
     bool run();
@@ -255,7 +246,7 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
     LIST* pair = copy_of_statement(cell);
     const SYMTAB* temp = split_out_multiply(pair);
     if (!temp) {
-        erase_list(pair);
+        erase_tree_list(pair);
         return false;
     }
     std::swap(pair->first, pair->rest->first);
@@ -265,7 +256,7 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
     // Where no instruction does both, an addition beside the multiplication is a gain for the floating-point unit
     // alone.
     if (!is_call && !late->left->type->is_float()) {
-        erase_list(pair);
+        erase_tree_list(pair);
         erase_tree(late);
         erase_tree(zero);
         return false;
@@ -273,7 +264,7 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
     erase_tree(cell->first);
     cell->first = std::exchange(pair->first, nullptr);
     if (pair->rest) insert_behind(cell, std::exchange(pair->rest->first, nullptr), cell->psn);
-    erase_list(pair);
+    erase_tree_list(pair);
     for (BBLK* entry : r.entries) insert_at_end_of_body(entry, copy_tree(zero));
     erase_tree(zero);
     if (r.exit->predecessors->rest) {

@@ -207,5 +207,7 @@ private:
 
 void make_references(struct LOOP* root) {
     allow_work_on_givens();
+    keep_symbol_values(true); // statements stay as they are
     WALK(root).run();
+    keep_symbol_values(false);
 }

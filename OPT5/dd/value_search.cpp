@@ -271,8 +271,9 @@ NODE* asserted_value(const SYMTAB* sym, const struct LOOP* loop) {
 
 NODE* find_symbol_value(SYMTAB* sym, BBLK* at_end_of, struct LOOP* loop, int budget, int depth) {
     if (NODE* v = asserted_value(sym, loop)) return v;
+    if (!may_be_searched(sym) || (sym->type->qual_kind(false) & QUAL_RESTRICT)) return nullptr;
     NODE* v = SEARCH(at_end_of, budget).value(sym, {at_end_of, AT_END}, depth);
-    if (v || !sym->type->is_pointer() || !may_be_searched(sym) || (sym->type->qual_kind(false) & QUAL_RESTRICT)) return v;
+    if (v || !sym->type->is_pointer()) return v;
     // Asked in the middle of a pass: what the search for bindings rests on is not found anew here.
     if (!is_known(fact::block_numbers | fact::alias_marks | fact::pointees)) return nullptr;
     need(fact::points_to);

@@ -146,6 +146,19 @@ static bool may_share_stack(TYPE* a, TYPE* b) {
            type_may_access_part_of(b, shared->type);
 }
 
+// The object whose name stands in the lvalue itself, or null.
+static const SYMTAB* object_named(const NODE* t) {
+    for (;;) {
+        t = without_wrappers(t);
+        if (t->op == STDOT && t->right && t->right->mval)
+            t = t->left;
+        else if (t->op == UMULT && !t->right && t->left->op == UAND && t->left->type->is_pointer())
+            t = t->left->left;
+        else
+            return t->op == NAME ? t->u.sym : nullptr;
+    }
+}
+
 bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, bool by_type, bool* unsure) {
     a = without_wrappers(a);
     b = without_wrappers(b);
@@ -157,6 +170,8 @@ bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, boo
         return true; // what their order is for may lie outside of memory
     // That only one is volatile says nothing: a plain object may be written through a pointer to volatile.
     if (a->op == NAME && b->op == NAME) return object_symbols_may_alias(a->u.sym, b->u.sym);
+    if (const SYMTAB* named = object_named(a))
+        if (const SYMTAB* other = object_named(b); other && other != named) return object_symbols_may_alias(named, other);
     const ADDRESS_FORM x = address_form(a), y = address_form(b);
     const SYMTAB *object_a = x.known_object(), *object_b = y.known_object();
     if (object_a && object_b) {

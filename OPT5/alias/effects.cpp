@@ -232,22 +232,80 @@ bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {
                        [lvalue](const NODE* t) { return is_operation_on_memory(t->op) && call_may_read(t, lvalue); });
 }
 
+// What a call in `t` reads is not in the tree: whether `a`, which has side effects, may change it.
+static bool is_read_by_call(const NODE* t) {
+    return any_subtree(t, [](const NODE* call) {
+        if (call->op == ICALL) return any_argument_reaches(call, nullptr, nullptr, false);
+        if (!op_is_call(call->op) && call->op != MCALL && call->op != UMCALL && call->op != MEMCPY) return false;
+        FUNINFO* f = find_FUNINFO_for_call(call);
+        return !(f && TEST_FLAG(f, FUN_is_pure_fun));
+    });
+}
+
 bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t) {
     if (tree_contains_op(t, ASM)) return true;
     if (any_lvalue_read(t, [a](const NODE* lvalue) { return tree_modifies_lvalue(a, lvalue); })) return true;
-    // What a call in `t` reads is not in the tree.
-    return any_subtree(t, [a](const NODE* call) {
-        if (call->op == ICALL) return any_argument_reaches(call, nullptr, nullptr, false) && tree_has_side_effects(a);
-        if (!op_is_call(call->op) && call->op != MCALL && call->op != UMCALL && call->op != MEMCPY) return false;
-        FUNINFO* f = find_FUNINFO_for_call(call);
-        return !(f && TEST_FLAG(f, FUN_is_pure_fun)) && tree_has_side_effects(a);
-    });
+    return is_read_by_call(t) && tree_has_side_effects(a);
 }
 
 bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t) {
     for (const LIST* s = bb->statements; s; s = s->rest)
         if (tree_modifies_lvalue_in_tree(s->first, t)) return true;
     return false;
+}
+
+// ---- Accesses, listed
+
+// Whether it may modify or read any lvalue, by more than being a part of an access.
+static bool acts_on_memory(const NODE* t) {
+    if (writes_left_operand(t->op) || is_operation_on_memory(t->op) || t->op == ASM || t->op == ARGREF) return true;
+    if (is_lvalue(t)) return lvalue_is_volatile(t);
+    return op_has_effect(t->op) && !op_transfers_control(t->op) && !is_inert(t->op);
+}
+
+size_t ACCESS_LISTS::add(const NODE* tree) {
+    RANGE r{tree, nodes.size(), 0, 0};
+    for_each_subtree(tree, [this](const NODE* t) {
+        if (acts_on_memory(t)) nodes.push_back(t);
+    });
+    r.reads = nodes.size();
+    any_lvalue_read(tree, [this](const NODE* t) {
+        nodes.push_back(t);
+        return false;
+    });
+    r.end = nodes.size();
+    trees.push_back(r);
+    return trees.size() - 1;
+}
+
+// What the node writes, whatever the types, and what else it does.
+static bool node_may_touch(const NODE* t, const NODE* lvalue, bool is_volatile) {
+    const bool writes_left = writes_left_operand(t->op) && t->left;
+    if (!writes_left && node_may_modify(t, lvalue, is_volatile)) return true;
+    if (is_operation_on_memory(t->op) && call_may_read(t, lvalue)) return true;
+    bool meets = false;
+    for_each_write_of_node(t, [&](const WRITE& w) {
+        meets = meets || (w.place && lvalues_may_be_aliased(access_of_place(w.place), lvalue, nullptr, false));
+    });
+    return meets;
+}
+
+bool ACCESS_LISTS::touches(size_t number, const NODE* lvalue) const {
+    const RANGE& r = trees[number];
+    auto any = [this](size_t from, size_t to, auto predicate) {
+        return std::any_of(nodes.begin() + static_cast<long>(from), nodes.begin() + static_cast<long>(to), predicate);
+    };
+    const bool is_volatile = lvalue_is_volatile(lvalue);
+    if (any(r.acts, r.reads, [=](const NODE* t) { return node_may_touch(t, lvalue, is_volatile); })) return true;
+    if (any(r.reads, r.end, [=](const NODE* t) { return lvalues_may_be_aliased(t, lvalue); })) return true;
+    if (name_accessed(lvalue)) return false; // of a fixed address
+    if (r.acts != r.reads && any_lvalue_read(lvalue, [&](const NODE* part) {
+            if (part == lvalue) return false;
+            const bool is_volatile_part = lvalue_is_volatile(part);
+            return any(r.acts, r.reads, [=](const NODE* t) { return node_may_modify(t, part, is_volatile_part); });
+        }))
+        return true;
+    return tree_contains_op(lvalue, ASM) || (is_read_by_call(lvalue) && tree_has_side_effects(r.tree));
 }
 
 // ---- What a tree reads

@@ -95,6 +95,23 @@ bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t);
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue);
 bool tree_touches_lvalue(const NODE* a, const NODE* lvalue);
 
+// What trees do to memory, listed once for trees that are asked about many lvalues. The trees must stand.
+class ACCESS_LISTS {
+public:
+    size_t add(const NODE* tree); // the number to ask by
+    // Whether the tree touches the lvalue, or modifies what its address is computed from. Types tell nothing apart from
+    // what the tree writes.
+    bool touches(size_t number, const NODE* lvalue) const;
+
+private:
+    struct RANGE {
+        const NODE* tree;
+        size_t acts, reads, end;
+    };
+    std::vector<const NODE*> nodes; // of each tree: those that act, then the lvalues it reads
+    std::vector<RANGE> trees;
+};
+
 // What a tree reads, summed up, for a tree about which many others are asked. Coarser than the alias rules: one access
 // through a pointer may meet any object that is reached by pointers.
 class READ_SET {

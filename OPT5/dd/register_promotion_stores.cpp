@@ -49,6 +49,8 @@ struct STORED {
     double weight = 0;
 };
 
+constexpr size_t NOT_LISTED = SIZE_MAX;
+
 // What a statement does that many candidates ask about.
 struct SUMMARY {
     LIST* cell;
@@ -59,6 +61,8 @@ struct SUMMARY {
     bool is_barrier = false;           // for all
     bool is_indirect = false;          // accesses something through a pointer, or may
     bool is_memory = false;            // names what pointers may reach
+    size_t number = NOT_LISTED;        // among the lists of accesses: of the tree, and
+    size_t right_number = NOT_LISTED;  // of the value that it assigns
 };
 
 class STORE_PROMOTER {
@@ -71,6 +75,7 @@ private:
     void summarize();
     SUMMARY summary_of(LIST* cell, size_t block);
     void find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& candidates);
+    bool touches(const NODE* tree, size_t& number, const STORED& s);
     void find_points(STORED& s);
     std::vector<size_t> statements_around(const SSAVAR* v) const;
     void find_dead_ends();
@@ -96,6 +101,7 @@ private:
     const NATURAL_LOOPS& loops;
     const FREQUENCIES frequencies;
     std::vector<SUMMARY> statements;
+    ACCESS_LISTS accesses; // of statements that were asked about, while they are as they were
     std::vector<size_t> indirect; // those that may touch what they do not name
     std::vector<size_t> memory;   // those that may touch what pointers reach
     std::unordered_map<const SYMTAB*, std::vector<size_t>> naming; // statements by symbol; looked up, never walked
@@ -171,14 +177,9 @@ void STORE_PROMOTER::find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& 
 
 // The place itself, or the pointer to it. Memory without a declared type takes that of the last store: two stores stay in
 // their order whatever their types.
-bool touches(const NODE* tree, const STORED& s) {
-    const NODE* place = s.c->variable->tree;
-    if (tree_touches_lvalue(tree, place) || tree_modifies_lvalue_in_tree(tree, place)) return true;
-    bool writes = false;
-    for_each_write(tree, [&](const WRITE& w) {
-        writes = writes || (w.place && lvalues_may_be_aliased(access_of_place(w.place), place, nullptr, false));
-    });
-    return writes;
+bool STORE_PROMOTER::touches(const NODE* tree, size_t& number, const STORED& s) {
+    if (number == NOT_LISTED) number = accesses.add(tree);
+    return accesses.touches(number, s.c->variable->tree);
 }
 
 // The statements that may touch the place or the pointer to it, in order: those that name it, and those that may reach
@@ -194,10 +195,10 @@ std::vector<size_t> STORE_PROMOTER::statements_around(const SSAVAR* v) const {
 
 void STORE_PROMOTER::find_points(STORED& s) {
     for (size_t i : statements_around(s.c->variable)) {
-        const SUMMARY& at = statements[i];
+        SUMMARY& at = statements[i];
         const bool stores = at.stored == s.c->variable;
         if (!stores && !at.is_barrier) --questions_left;
-        if (stores ? touches(at.assignment->right, s) : at.is_barrier || touches(at.tree, s))
+        if (stores ? touches(at.assignment->right, at.right_number, s) : at.is_barrier || touches(at.tree, at.number, s))
             s.points.push_back({at.block, nullptr});
         if (stores) s.points.push_back({at.block, at.cell});
     }

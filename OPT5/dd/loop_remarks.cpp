@@ -115,6 +115,12 @@ std::string place_in_text(const REFERENCE& r) {
     return r.statement->psn ? text + " of line " + std::to_string(r.statement->psn->line) : text;
 }
 
+bool is_one_place(const REFERENCE& a, const REFERENCE& b, const struct LOOP* loop) {
+    const NODE *address = a.lvalue->left, *index = a.lvalue->right;
+    return trees_are_congruent(a.lvalue, b.lvalue, false) && tree_is_RC_in_loop(address, loop, false) &&
+           (!index || tree_is_RC_in_loop(index, loop, false));
+}
+
 void tell_of_pair(const REFERENCE& store, const REFERENCE& other, const DVE& d) {
     const int distance = d.has_exact_distance() ? std::abs(d.exact_distance()) : 0;
     const char* const help = have_one_base(store.lvalue, other.lvalue) ? ": nothing tells their subscripts apart"
@@ -139,8 +145,12 @@ void tell_of_dependences(struct LOOP* loop, const PSN& place) {
             DVE d;
             compute_distances_for_loop(&d, a.lvalue, b.lvalue, loop);
             if (!is_between_iterations(d)) continue;
-            tell_of_pair(a.is_write ? a : b, a.is_write ? b : a, d);
             ++told;
+            if (is_one_place(a, b, loop))
+                remark("dependence", a.statement->psn, REMARK::MISSED,
+                       "iterations stay in order: '" + reference_text(a.lvalue) + "' is one place for all: use a local variable in the loop");
+            else
+                tell_of_pair(a.is_write ? a : b, a.is_write ? b : a, d);
         }
     if (!told) remark("dependence", &place, REMARK::DONE, "no access to memory keeps its iterations in order");
 }

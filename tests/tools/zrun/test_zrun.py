@@ -1,13 +1,15 @@
-"""tools/zrun: its statuses, what it shows and what it keeps. ZOPT, ICRUN, ICDUMP and ICPARSE name the programs."""
+"""tools/zrun and tools/zview: their statuses, what they show and what they keep. ZOPT, ICRUN, ICDUMP and ICPARSE name the programs."""
 import json
 import os
 import re
+import shutil
 import subprocess
 import tempfile
 import unittest
 from pathlib import Path
 
 ZRUN = Path(__file__).resolve().parents[3] / "tools" / "zrun"
+ZVIEW = ZRUN.with_name("zview")
 
 PROGRAM = """#include <zrun.h>
 static int f(int x) { goto next; next: return x + 1; }
@@ -103,7 +105,7 @@ class Zrun(unittest.TestCase):
         for name in "remarks", "remarkz", "remarks":
             out, told = self.folder / "out.if", self.folder / "told"
             subprocess.run([os.environ["ZOPT"], "-o3", f"--debug:{name}={told}", self.folder / "p.if", out], check=True,
-                           stdout=subprocess.DEVNULL)
+                           stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)  # there is no switch remarkz
             written.add(out.read_bytes().replace(b"remarkz", b"remarks"))
         self.assertEqual(len(written), 1)
         for remark in map(json.loads, told.read_text().splitlines()):
@@ -111,6 +113,42 @@ class Zrun(unittest.TestCase):
             self.assertIn(remark["kind"], {"done", "missed", "note"})
         over = subprocess.run([os.environ["ZOPT"], f"--debug:remarks={out}", self.folder / "p.if", out], stderr=subprocess.PIPE)
         self.assertEqual(over.returncode, 1, over.stderr)
+
+    def test_steps(self):
+        done = self.zrun("-o2", "--steps", "f", source=TOLD)
+        self.assertEqual(done.returncode, 0, done.stderr)
+        steps = re.findall(r"(?m)^(\S+): step (.*): -(\d+) \+(\d+)\n((?:    .*\n)*)", done.stdout)
+        self.assertEqual({step[0] for step in steps}, {"_f"})
+        for _, name, less, more, lines in steps:
+            signs = [line[4] for line in lines.splitlines()]
+            self.assertEqual((signs.count("-"), signs.count("+")), (int(less), int(more)), name)
+            self.assertNotEqual((less, more), ("0", "0"), name)
+        rotation = [step[4] for step in steps if step[1] == "67 Zelkova rotate loops"]
+        self.assertRegex(rotation[0], r"(?m)^    - +6  a \+= .*\n    \+ +6  __parallel_mpy_add")
+        done = self.zrun("-o2", "--step", "ROTATE LOOPS", source=TOLD)
+        self.assertEqual(re.findall(r"(?m)^(\S+: step .*): -", done.stdout), ["_f: step 67 Zelkova rotate loops"])
+        self.assertEqual(self.zrun("--steps=absent").returncode, 2)
+
+    def test_page(self):
+        source, page = self.folder / "p.c", self.folder / "page.html"
+        source.write_text(TOLD.replace("x[n] != 7", 'x[n] != sizeof "</script>" - 3'))
+        done = subprocess.run([ZVIEW, source, "-o", page, "-o2"], stderr=subprocess.PIPE, text=True)
+        self.assertEqual(done.returncode, 0, done.stderr)
+        text = page.read_text()
+        self.assertEqual(text.count("</script>"), 1)
+        self.assertNotRegex(text, r"https?://|<link|src=")
+        data = json.loads(re.search(r"(?m)^const data = (.*);$", text)[1])
+        f = next(f for f in data["functions"] if f["name"] == "_f")
+        self.assertIn("67 Zelkova rotate loops", [step["name"] for step in f["steps"]])
+        for step in f["steps"]:
+            self.assertTrue(any(row[2] for row in step["rows"] if isinstance(row, list)), step["name"])
+        self.assertEqual([f[side].count('class="loop"') for side in ("before", "after")], [4, 4])
+        self.assertEqual([name for name, *_ in data["counts"]][0], "nodes")
+        self.assertEqual(subprocess.run([ZVIEW, self.folder / "absent.c", "-o", page], stderr=subprocess.PIPE).returncode, 2)
+        if browser := shutil.which("chromium"):
+            shown = subprocess.run([browser, "--headless", "--no-sandbox", "--disable-gpu", f"--user-data-dir={self.folder}",
+                                    "--dump-dom", f"file://{page}#_f"], stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True)
+            self.assertIn(f"{len(f['steps'])} of the {len(f['steps'])} steps that changed _f", shown.stdout)
 
     def test_different(self):
         self.assertEqual(self.zrun("--keep", self.folder, source=PROGRAM.replace("41", "42")).returncode, 0)

@@ -8,7 +8,7 @@ NODE = re.compile(r'\s+(f\d+_\w+) \[label="((?:[^"\\]|\\.)*)"')
 EDGE = re.compile(r'\s+(f\d+_\w+) -> (f\d+_\w+)(?: \[label="((?:[^"\\]|\\.)*)")?')
 FUNCTION = re.compile(r'\s+label="((?:[^"\\]|\\.)*)"; node')
 
-LINE, CHARACTER, PAD, GAP, LANE, MOST_COLUMNS, MOST_LINES = 14, 7.3, 6, 20, 9, 70, 14
+LINE, CHARACTER, PAD, GAP, LANE, INSET, MOST_COLUMNS, MOST_LINES, MOST_BLOCKS = 14, 7.3, 6, 20, 9, 8, 70, 14, 500
 
 
 @dataclass
@@ -86,7 +86,18 @@ def lanes(spans):
     return lane_of, len(taken)
 
 
+def insets(nest):
+    """How far the box of each loop stands out: more than those within."""
+    found = [INSET] * len(nest)
+    for i in reversed(range(len(nest))):  # smaller ones first
+        inner = [found[j] for j in range(i + 1, len(nest)) if nest[j][1] <= nest[i][1]]
+        found[i] += max(inner, default=0)
+    return found
+
+
 def picture(flow):
+    if len(flow.blocks) > MOST_BLOCKS:
+        return f"{len(flow.blocks)} blocks: too many for a picture"
     texts = {name: shortened(lines) or [" "] for name, lines in flow.blocks.items()}
     order = {name: i for i, name in enumerate(texts)}
     tops, y = {}, GAP
@@ -96,16 +107,17 @@ def picture(flow):
     bottom = {name: tops[name] + len(lines) * LINE + 2 * PAD for name, lines in texts.items()}
     width = max((len(line) for lines in texts.values() for line in lines), default=1) * CHARACTER + 2 * PAD
     nest, down, up = loops(flow), {}, {}
+    box = insets(nest)
+    widest = max(box, default=0)
     for i, (start, end, _) in enumerate(flow.edges):
         if order[end] != order[start] + 1:
             (down if order[end] > order[start] else up)[i] = tuple(sorted((bottom[start], tops[end])))
     down_lane, down_count = lanes(down)
     up_lane, up_count = lanes(up)
-    left = (up_count + 2) * LANE + 8 * len(nest)
+    left = (up_count + 2) * LANE + widest
     right, out = left + width, []
-    for depth, (header, body) in enumerate(nest):
+    for (_, body), inset in zip(nest, box):
         first, last = min(body, key=order.get), max(body, key=order.get)
-        inset = 8 * (len(nest) - depth)
         out.append(f'<rect class="loop" x="{left - inset}" y="{tops[first] - 8}" width="{width + 2 * inset}" '
                    f'height="{bottom[last] - tops[first] + 16}" rx="6"><title>loop of {len(body)} blocks</title></rect>')
     for name, lines in texts.items():
@@ -115,17 +127,17 @@ def picture(flow):
     for i, (start, end, label) in enumerate(flow.edges):
         y1, y2 = bottom[start], tops[end]
         if i in down:
-            x = right + 8 * len(nest) + (down_lane[i] + 1) * LANE
+            x = right + widest + (down_lane[i] + 1) * LANE
             path = f"M{right} {y1 - 5} H{x} V{y2 + 5} H{right + 3}"
         elif i in up:
-            x = left - 8 * len(nest) - (up_lane[i] + 1) * LANE
+            x = left - widest - (up_lane[i] + 1) * LANE
             path = f"M{left} {y1 - 5} H{x} V{y2 + 5} H{left - 3}"
         else:
             x = left + width / 2
             path = f"M{x} {y1} V{y2 - 3}"
         kind = "back" if i in up else "edge"
         out.append(f'<path class="{kind}" marker-end="url(#tip)" d="{path}"><title>{escape(label)}</title></path>')
-    full = right + 8 * len(nest) + (down_count + 2) * LANE
+    full = right + widest + (down_count + 2) * LANE
     return (f'<svg width="{full:.0f}" height="{y}" viewBox="0 0 {full:.0f} {y}"><defs><marker id="tip" orient="auto" '
             f'markerWidth="6" markerHeight="6" refX="5" refY="3"><path d="M0 0 L6 3 L0 6 z"/></marker></defs>'
             f'{"".join(out)}</svg>')

@@ -28,12 +28,6 @@ struct ENTRY {
 std::set<ENTRY> remarks;
 std::mutex remarks_lock;
 
-ENTRY entry_at(const char* pass, const PSN* psn, REMARK kind) {
-    ENTRY e{psn && psn->file ? psn->file : "", psn ? psn->line : 0, psn ? psn->column : 0, "", pass, kind, ""};
-    if (currfuninfo) e.function = currfuninfo->name;
-    return e;
-}
-
 const char* name_of(REMARK kind) {
     return kind == REMARK::DONE ? "done" : kind == REMARK::MISSED ? "missed" : "note";
 }
@@ -78,19 +72,10 @@ std::string quoted(const std::string& s) {
 
 void remark(const char* pass, const PSN* position, REMARK kind, const std::string& text) {
     if (!remarks_are_wanted) return;
-    ENTRY e = entry_at(pass, position, kind);
-    e.text = text;
+    ENTRY e{"", 0, 0, currfuninfo ? currfuninfo->name : "", pass, kind, text};
+    if (position) e.file = position->file ? position->file : "", e.line = position->line, e.column = position->column;
     const std::lock_guard<std::mutex> lock(remarks_lock);
     remarks.insert(std::move(e));
-}
-
-void withdraw_missed(const char* pass, const PSN* position) {
-    if (!remarks_are_wanted) return;
-    const ENTRY first = entry_at(pass, position, REMARK::MISSED);
-    ENTRY last = first;
-    last.kind = REMARK::NOTE;
-    const std::lock_guard<std::mutex> lock(remarks_lock);
-    remarks.erase(remarks.lower_bound(first), remarks.lower_bound(last));
 }
 
 void write_remarks_as_text(FILE* out, bool with_notes) {

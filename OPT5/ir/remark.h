@@ -23,8 +23,6 @@ extern bool remarks_are_wanted;
 
 // Of the current function, if there is one. The position may be null.
 void remark(const char* pass, const PSN* position, REMARK kind, const std::string& text);
-// What a pass missed there it has done after all.
-void withdraw_missed(const char* pass, const PSN* position);
 
 void write_remarks_as_text(FILE* out, bool with_notes);
 void write_remarks_as_JSON(FILE* out); // an object a line

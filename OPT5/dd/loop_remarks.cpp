@@ -5,6 +5,7 @@
 
 #include "OPT5/alias/alias.h"
 #include "OPT5/dd/dependence.h"
+#include "OPT5/dd/inductions.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/dd/ssa.h"
 #include "OPT5/ir/bblk.h"
@@ -105,7 +106,21 @@ std::vector<REFERENCE> references_of(const struct LOOP* loop) {
 
 bool have_one_base(const NODE* a, const NODE* b) {
     const NODE *x = address_expr_base(a->left), *y = address_expr_base(b->left);
-    return x && y && trees_are_congruent(x, y, false);
+    return trees_are_congruent(a->left, b->left, false) || (x && y && trees_are_congruent(x, y, false));
+}
+
+// Whether something is written that is no reference of the list and no private variable: nothing can be said of that.
+bool writes_otherwise(const struct LOOP* loop) {
+    const auto is_other = [](const NODE* n, const NODE* statement) {
+        if (n->op == MCALL || n->op == ASM) return true;
+        if (!writes_left_operand(n->op)) return false;
+        const NODE* target = without_members(n->left);
+        return target->op == UMULT ? n != statement : target->op != NAME || !is_private_scalar(target->u.sym);
+    };
+    for (const BBLK* bb : loop->contents)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            if (any_subtree(s->first, [&](const NODE* n) { return is_other(n, s->first); })) return true;
+    return false;
 }
 
 bool is_between_iterations(const DVE& d) { return d.has_FWD_dirs() || d.has_BWD_dirs(); }
@@ -152,7 +167,8 @@ void tell_of_dependences(struct LOOP* loop, const PSN& place) {
             else
                 tell_of_pair(a.is_write ? a : b, a.is_write ? b : a, d);
         }
-    if (!told) remark("dependence", &place, REMARK::DONE, "no access to memory keeps its iterations in order");
+    if (!told && !writes_otherwise(loop))
+        remark("dependence", &place, REMARK::DONE, "no access to memory keeps its iterations in order");
 }
 
 } // namespace

@@ -4,6 +4,7 @@
 #include "OPT5/alias/points_to_checks.h"
 
 #include "OPT5/alias/bindings.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
@@ -87,6 +88,7 @@ void find_accesses(const NODE* t, std::vector<const NODE*>& accesses) {
 void insert_PT_checks() {
     if (!pass_debug_PT_checks || !PT_store()) return;
     const CHECKS checks;
+    bool is_changed = false;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (LIST** link = &bb->statements; *link; link = &(*link)->rest) {
             std::vector<const NODE*> accesses;
@@ -94,7 +96,10 @@ void insert_PT_checks() {
             for (const NODE* t : accesses) {
                 if (tree_has_side_effects(t->left)) continue;
                 NODE* c = checks.condition(t->left, *PT_info_of(t));
-                if (c) link = &(*insert_before(link, maketree(NASSERT, c, nullptr, tp->int_t), (*link)->psn));
+                if (!c) continue;
+                link = &(*insert_before(link, maketree(NASSERT, c, nullptr, tp->int_t), (*link)->psn));
+                is_changed = true;
             }
         }
+    if (is_changed) changed(~fact::alias_marks); // the checks take addresses
 }

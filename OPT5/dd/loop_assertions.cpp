@@ -66,12 +66,13 @@ NODE* replaced_by(NODE* t, NODE* kept) {
 // Gives 1 or 0, by its operator.
 bool is_truth_value(const NODE* t) { return boolean_result[t->op] && !op_is_float_compare(t->op); }
 
-// (a < b) == 0 as a >= b, and the like; null where it is nothing of that kind.
+// (a < b) == 0 as a >= b, and the like; null where it is nothing of that kind. (a && b) == 0 has no shorter form.
 NODE* reduced_boolean(NODE* t) {
     if ((t->op != EQ && t->op != NEQ) || t->right->op != ICON || !is_truth_value(t->left)) return nullptr;
     const bool is_zero = is_icon(t->right, INT65(0));
     if (!is_zero && !is_icon(t->right, INT65(1))) return nullptr;
     const bool holds = is_zero == (t->op == NEQ);
+    if (!holds && is_zero && !tree_is_trivially_invertible(t->left)) return nullptr;
     NODE* inner = replaced_by(t, t->left);
     return holds ? inner : invert_boolean_tree(inner);
 }

@@ -1,5 +1,6 @@
 // A loop whose counter starts from a constant is entered behind its first test.
 // RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
+// LEVELS: 3
 #include <zrun.h>
 
 int g[40], n = 3;
@@ -151,6 +152,24 @@ long promised(int k, int *p) {
     return s;
 }
 
+// What a test ahead of a loop says may be that not both of two things hold; that has no simpler form.
+// FUNCTION: not_both
+// HAS: /goto/
+static int bits(unsigned long v) {
+    int count = 0;
+    while (v) {
+        v &= v - 1;
+        count++;
+    }
+    return count;
+}
+
+unsigned not_both(int to) {
+    unsigned y = 3;
+    for (long l = 0; l < to; l++) y = y && l ? (n = (int)l * 3, n % 100) : bits(l);
+    return y;
+}
+
 int main(void) {
     int p[8] = {0};
     counted();
@@ -158,6 +177,7 @@ int main(void) {
     put_i16(between(g) + in_object() + not_in_object(g));
     put_i16(stepped(1));
     put_i32(promised(4, p));
+    put_u32(not_both(12));
     for (int i = 0; i < 5; i++) {
         g[i] = i * 7 - 5;
         put_i16(chosen(g, i) + read_behind(g, i));

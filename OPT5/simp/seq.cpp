@@ -18,6 +18,7 @@
 #include "OPT5/target/bif.h"
 #include "UTIL/abort.h"
 
+#include <cstring>
 #include <vector>
 
 namespace {
@@ -258,11 +259,17 @@ private:
     LS* scope = nullptr;
 };
 
+constexpr char NEVER_EXECUTED[] = "_never_executed";
+
+void return_behind(LIST** out, PSN* psn) {
+    *out = mkelist(maketree(URETURN, mk_NAME(currfunc), nullptr, tp->void_t, LS::level_2_scope()), *out, psn);
+}
+
 // A call of a function that never returns ends the flow of control: what the program has behind it is not reached.
 void end_flow_behind(LIST** out, PSN* psn) {
     *out = mkelist(mk_ASM(ASM_COMMENT, "***\t; the preceding call never returns"), *out, psn);
-    *out = mkelist(mk_MCALL("_never_executed", nullptr, tp->void_t), *out, psn);
-    *out = mkelist(maketree(URETURN, mk_NAME(currfunc), nullptr, tp->void_t, LS::level_2_scope()), *out, psn);
+    *out = mkelist(mk_MCALL(NEVER_EXECUTED, nullptr, tp->void_t), *out, psn);
+    return_behind(out, psn);
 }
 
 bool is_call_that_never_returns(const NODE* t) {
@@ -306,6 +313,8 @@ void seq_trees(NODE* (*prepare)(NODE*)) {
         sequencer.statement(t);
         if (const NODE* last = sequencer.last_statement(); last && is_call_that_never_returns(last))
             end_flow_behind(&out, psn);
+        else if (last && prepare && last->op == UMCALL && !std::strcmp(last->u.name, NEVER_EXECUTED))
+            return_behind(&out, psn); // the mark of an earlier optimization
     }
     f->statements = out;
     f->has_vector_types = false;

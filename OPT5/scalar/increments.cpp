@@ -101,7 +101,9 @@ public:
         case QUEST: return both(of(t->left, is_conditional), of(t->right, true));
         case IF:
         case SWITCH: return of(t->left, is_conditional);
-        case UAND: return without_hit(of(t->left, is_conditional)); // an address, no access
+        case UAND:                                                  // an address, no access
+        case ASSERT:                                                // nor need these be evaluated
+        case NASSERT: return without_hit(of(t->left, is_conditional));
         case UMULT:
             if (!t->right && absorbs(t)) return is_conditional ? USE{USE::BLOCKED, nullptr} : USE{USE::HIT, t};
             break;

@@ -77,7 +77,7 @@ class Faults(unittest.TestCase):
                 self.assertEqual(done.returncode, 1, done.stdout + done.stderr)
                 self.assertIn("FAIL right --opt_level=3", done.stdout)
                 self.assertIn(said, done.stdout)
-                self.assertRegex(done.stdout, r"1 programs, 7 runs, 1 differences, 0 skipped\n$")
+                self.assertRegex(done.stdout, r"1 programs, 8 runs, 1 differences, 0 skipped\n$")
                 kept = self.folder / "found" / "right"
                 self.assertEqual((kept / "right.c").read_text(), PROGRAM.format(7))
                 self.assertIn("--opt_level=3", (kept / "show.sh").read_text())
@@ -95,7 +95,7 @@ class Faults(unittest.TestCase):
 
     def test_a_sound_optimizer_has_no_differences(self):
         done = self.fuzz("cp $in $out")
-        self.assertEqual((done.returncode, done.stdout), (0, "1 programs, 11 runs, 0 differences, 0 skipped\n"))
+        self.assertEqual((done.returncode, done.stdout), (0, "1 programs, 12 runs, 0 differences, 0 skipped\n"))
         self.assertFalse((self.folder / "found").exists())
 
     def test_an_endless_program_is_skipped(self):

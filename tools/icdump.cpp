@@ -11,6 +11,7 @@ const char help[] = "icdump [option...] FILE    prints an I-file as text\n"
                     "  --psn     with source positions\n"
                     "  --raw     offset, kind, name and size of each record, also of files that are damaged\n"
                     "  --dot     the control flow of each function, for Graphviz\n"
+                    "  --function NAME   with --dot: of this function alone\n"
                     "  --help    this text\n"
                     "Status 1 if the file is not a sound I-file.\n";
 
@@ -53,17 +54,20 @@ int print_raw(FILE* stream, const char* name) {
     return 0;
 }
 
-int print_parsed(FILE* stream, const char* name, bool dot, const IC_PRINT_OPTIONS& options) {
+int print_parsed(FILE* stream, const char* name, bool dot, const std::string& function,
+                 const IC_PRINT_OPTIONS& options) {
     try {
         IC_UNIT unit;
+        bool found = true;
         unit.read(stream, ic_type_package());
         run_on_big_stack(printing_stack, [&] {
             if (dot)
-                ic_print_dot(stdout, unit);
+                found = ic_print_dot(stdout, unit, function);
             else
                 ic_print_unit(stdout, unit, options);
         });
-        return 0;
+        if (!found) std::fprintf(stderr, "icdump: %s: there is no function %s\n", name, function.c_str());
+        return !found;
     } catch (const if_error& error) {
         const char* text = error.what();
         while (*text == '\n') text++;
@@ -78,6 +82,7 @@ int main(int argc, char** argv) {
     bool raw = false, dot = false;
     IC_PRINT_OPTIONS options;
     const char* name = nullptr;
+    std::string function;
     for (int i = 1; i < argc; i++) {
         std::string word = argv[i];
         if (word == "--help") {
@@ -88,6 +93,8 @@ int main(int argc, char** argv) {
             raw = true;
         else if (word == "--dot")
             dot = true;
+        else if (word == "--function" && i + 1 < argc)
+            function = argv[++i];
         else if (word == "--types")
             options.types = true;
         else if (word == "--psn")
@@ -107,7 +114,7 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "icdump: %s: %s\n", name, std::strerror(errno));
         return 1;
     }
-    int status = raw ? print_raw(stream, name) : print_parsed(stream, name, dot, options);
+    int status = raw ? print_raw(stream, name) : print_parsed(stream, name, dot, function, options);
     if (std::fflush(stdout) != 0) status = 1;
     return status;
 }

@@ -8,7 +8,8 @@ using namespace if_op;
 namespace {
 struct BLOCK {
     std::string text;
-    std::vector<std::pair<uint32_t, const char*>> jumps; // label, and what the edge is called
+    std::vector<std::pair<uint32_t, std::string>> jumps; // label, and what the edge is called
+    bool is_test = false;                                // its jump is taken where the condition holds that it shows
     bool falls_through = true;
     bool returns = false;
     bool empty = true;
@@ -23,7 +24,8 @@ struct LOOPS {
 
     void add(const IC_FACTS* record) {
         const uint32_t id = record->word[0], outer = record->word[1];
-        if (records.emplace(id, record).second && id && id != outer) inside[outer].push_back(id); // a tree, whatever they say
+        if (records.emplace(id, record).second && id && id != outer)
+            inside[outer].push_back(id); // a tree, whatever they say
     }
     std::string label(uint32_t id) const {
         const uint32_t* w = records.at(id)->word;
@@ -46,7 +48,8 @@ struct LOOPS {
             const auto children = inside.find(at.id);
             if (children != inside.end() && at.next < children->second.size()) {
                 const uint32_t child = children->second[at.next++];
-                std::fprintf(out, "    subgraph cluster_%zu_%u {\n    label=\"%s\";\n", function, child, label(child).c_str());
+                std::fprintf(out, "    subgraph cluster_%zu_%u {\n    label=\"%s\";\n", function, child,
+                             label(child).c_str());
                 path.push_back({child, 0});
                 continue;
             }
@@ -67,6 +70,11 @@ std::string escaped(const std::string& line) {
     return text + "\\l";
 }
 
+std::string escaped_text(const IC_NODE* t) {
+    const std::string line = escaped(ic_expr_text(t, {}));
+    return line.substr(0, line.size() - 2);
+}
+
 uint32_t target(const IC_NODE* label) { return label && label->op == LABEL ? label->number : 0; }
 
 // What a statement does to the block that it ends; false if it ends none.
@@ -81,13 +89,16 @@ bool end_block(const IC_NODE* t, BLOCK& block) {
         block.falls_through = false;
         block.jumps.emplace_back(target(t->left), "");
         return true;
-    case CBRANCH: block.jumps.emplace_back(target(t->right), "false"); return true;
+    case CBRANCH:
+        block.jumps.emplace_back(target(t->right), "true");
+        block.is_test = true;
+        return true;
     case SWITCH: {
         block.falls_through = false;
         const IC_NODE* arm = t->right;
         for (;; arm = arm->left) {
             const IC_NODE* one = arm && arm->op == COMMA ? arm->right : arm;
-            if (one && one->op == CASE) block.jumps.emplace_back(target(one->right), "case");
+            if (one && one->op == CASE) block.jumps.emplace_back(target(one->right), "case " + escaped_text(one->left));
             if (one && one->op == DEFAULT) block.jumps.emplace_back(target(one->left), "default");
             if (!arm || arm->op != COMMA) return true;
         }
@@ -130,13 +141,15 @@ void print_function(FILE* out, const IC_UNIT& unit, const IC_FUNC& f, size_t num
     loops.print(out, number);
     for (size_t b = 0; b < blocks.size(); b++) {
         std::fprintf(out, "    f%zu_b%zu [label=\"%s\"];\n", number, b, blocks[b].text.c_str());
-        for (auto [label, name] : blocks[b].jumps) {
+        for (const auto& [label, name] : blocks[b].jumps) {
             auto to = block_of_label.find(label);
             if (to != block_of_label.end())
-                std::fprintf(out, "    f%zu_b%zu -> f%zu_b%zu [label=\"%s\"];\n", number, b, number, to->second, name);
+                std::fprintf(out, "    f%zu_b%zu -> f%zu_b%zu [label=\"%s\"];\n", number, b, number, to->second,
+                             name.c_str());
         }
         if (blocks[b].falls_through && b + 1 < blocks.size())
-            std::fprintf(out, "    f%zu_b%zu -> f%zu_b%zu;\n", number, b, number, b + 1);
+            std::fprintf(out, "    f%zu_b%zu -> f%zu_b%zu%s;\n", number, b, number, b + 1,
+                         blocks[b].is_test ? " [label=\"false\"]" : "");
         if (blocks[b].returns || (blocks[b].falls_through && b + 1 == blocks.size()))
             std::fprintf(out, "    f%zu_b%zu -> f%zu_exit;\n", number, b, number);
     }
@@ -144,8 +157,15 @@ void print_function(FILE* out, const IC_UNIT& unit, const IC_FUNC& f, size_t num
 }
 } // namespace
 
-void ic_print_dot(FILE* out, const IC_UNIT& unit) {
+bool ic_print_dot(FILE* out, const IC_UNIT& unit, const std::string& function) {
+    bool any = function.empty();
     std::fputs("digraph unit {\n", out);
-    for (size_t i = 0; i < unit.functions.size(); i++) print_function(out, unit, unit.functions[i], i);
+    for (size_t i = 0; i < unit.functions.size(); i++) {
+        const char* name = unit.functions[i].sym->name;
+        if (!function.empty() && function != name && "_" + function != name) continue;
+        print_function(out, unit, unit.functions[i], i);
+        any = true;
+    }
     std::fputs("}\n", out);
+    return any;
 }

@@ -275,11 +275,13 @@ void PRINTER::statement(const IC_NODE* t) {
     case RETURN: text += "return "; return expr(t->right, 0);
     case URETURN: text += "return"; return;
     case BRANCH: text += "goto "; return label(t->left);
-    case CBRANCH: // the branch is taken when the condition is false
-        text += "if (!(";
-        expr(t->left, 0);
-        text += ")) goto ";
+    case CBRANCH: { // the branch is taken when the condition is false
+        const bool is_negated = t->left && t->left->op == EXCLAIM;
+        text += is_negated ? "if (" : "if (!(";
+        expr(is_negated ? t->left->left : t->left, 0);
+        text += is_negated ? ") goto " : ")) goto ";
         return label(t->right);
+    }
     case SWITCH: return switch_statement(t);
     default: expr(t, 0);
     }

@@ -14,5 +14,5 @@ std::string ic_expr_text(const IC_NODE* tree, const IC_PRINT_OPTIONS& options);
 // For each loop that the items from `first` to `last`, of one function, have a record of: what keeps its iterations apart as
 // far as memory is concerned, in lines. Empty without records.
 std::vector<std::string> ic_dependence_words(const IC_UNIT& unit, size_t first, size_t last);
-// The control flow of each function as a Graphviz graph.
-void ic_print_dot(FILE* out, const IC_UNIT& unit);
+// The control flow of each function, or of the one of that name, as a Graphviz graph. False if there is none of that name.
+bool ic_print_dot(FILE* out, const IC_UNIT& unit, const std::string& function = "");

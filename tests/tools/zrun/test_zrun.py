@@ -87,6 +87,7 @@ class Zrun(unittest.TestCase):
         self.assertRegex(done.stdout, r"\nloop 1 of line 3: .*\n(    .*\n)*loop 2 of line 5: ")
         dot = subprocess.run([os.environ["ICDUMP"], "--dot", self.folder / "p.opt.if"], stdout=subprocess.PIPE, text=True).stdout
         self.assertRegex(dot, r"(?s)cluster_\d_1 \{\s*label=\"loop 1: [^}]*cluster_\d_2 \{\s*label=\"loop 2: [^}]*\}[^}]*\}")
+        self.assertEqual(dot.count('[label="true"]'), dot.count('[label="false"]')) # of each test, as it is printed
 
     def test_remarks(self):
         done = self.zrun("--opt_level=3", "--unified_memory", "--remarks", source=TOLD)

@@ -4,7 +4,7 @@ import os
 import sys
 
 from . import preprocess, types as T
-from .errors import CompileError
+from .errors import CompileError, all_errors
 from .model import Unit
 from .translator import Translator, finish
 from .writer import Writer
@@ -61,6 +61,18 @@ def translate(options, rewrite=None):
     return Writer(unit).bytes()
 
 
+def show_source(where):
+    """The line of an error, and a mark under its column."""
+    if not where or not where.column or not os.path.isfile(where.file):
+        return
+    with open(where.file, encoding="utf-8", errors="replace") as source:
+        lines = source.read().splitlines()
+    if 0 < where.line <= len(lines):
+        line = lines[where.line - 1]
+        indent = "".join("\t" if c == "\t" else " " for c in line[:where.column - 1])
+        print(f"    {line}\n    {indent}^", file=sys.stderr)
+
+
 def main(arguments, rewrite=None):
     options = parse_arguments(arguments)
     sys.setrecursionlimit(20000)
@@ -69,7 +81,9 @@ def main(arguments, rewrite=None):
     except CompileError as error:
         if os.path.isfile(options.output):
             os.remove(options.output)
-        print(error, file=sys.stderr)
+        for one in all_errors(error):
+            print(one, file=sys.stderr)
+            show_source(one.where)
         return 1
     with open(options.output, "wb") as out:
         out.write(data)

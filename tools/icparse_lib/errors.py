@@ -12,6 +12,21 @@ class CompileError(Exception):
         return f"{self.where}: error: {self.message}" if self.where else f"error: {self.message}"
 
 
+class CompileErrors(CompileError):
+    """More than one, in the order of the source."""
+
+    def __init__(self, errors):
+        super().__init__(errors[0].where, errors[0].message)
+        self.errors = errors
+
+    def __str__(self):
+        return "\n".join(map(str, self.errors))
+
+
+def all_errors(error):
+    return getattr(error, "errors", [error])
+
+
 class Position:
     """File, line and column of something in the source."""
     __slots__ = ("file", "line", "column")

@@ -24,7 +24,8 @@ BUILT_IN_TYPES = "".join(f"typedef int {name};\n" for name in sorted(BUILT_IN_NA
 PREDEFINED = ("__attribute__(words)=", "__attribute(words)=",
               "__ZELKOVA__=1", "__signed__=signed", "__inline=inline", "__inline__=inline", "__restrict=restrict",
               "__restrict__=restrict", "__const=const", "__volatile=volatile", "__extension__=",
-              '__interrupt=_Pragma("INTERRUPT_NEXT")')
+              '__interrupt=_Pragma("INTERRUPT_NEXT")', 'interrupt=_Pragma("INTERRUPT_NEXT")',
+              "cregister=", "__cregister=")  # control registers are reached as memory is
 
 
 def preprocess(path, include_dirs, defines, eabi):

@@ -167,8 +167,19 @@ class Statements:
         self.regions.append(len(entries))
 
     def function_body(self, compound):
+        errors, depth, items = self.translator.errors, len(self.scopes.stack), self.items
+        count = len(errors)
         for item in compound.block_items or []:
-            self.statement(item)
+            try:
+                self.statement(item)
+            except CompileError as error:
+                if isinstance(item, A.Decl):
+                    raise  # what it was to declare is missing in all that follows
+                errors.append(error)
+                del self.scopes.stack[depth:]
+                self.items = items
+        if len(errors) > count:
+            return
         if self.regions:
             raise CompileError(self.body.position, "a region of exceptions has no end")
         for name, (_, defined, where) in self.labels.items():

@@ -6,7 +6,7 @@ from pycparser import c_ast as A
 
 from . import constants, literals, pragmas, trees, types as T
 from .declarations import TypeBuilder
-from .errors import CompileError, position_of
+from .errors import CompileError, CompileErrors, position_of
 from .expressions import Expressions
 from .initializers import Initializers
 from .model import FunctionBody, Op, Statement, Symbol, Text
@@ -34,6 +34,7 @@ class Translator:
         self.expressions = Expressions(self)
         self.initializers = Initializers(self)
         self.symbol_pragmas = pragmas.SymbolPragmas()
+        self.errors = []  # of declarations and statements that were left behind
         self.next_is_interrupt = False  # the next function declared is an interrupt routine
 
     # ---- Services
@@ -88,17 +89,27 @@ class Translator:
     # ---- The file
     def file(self, tree):
         for node in tree.ext:
-            if isinstance(node, A.FuncDef):
-                self._function(node)
-            elif isinstance(node, A.Pragma):
-                self.pragma(node)
-            elif isinstance(node, A.StaticAssert):
-                self.static_assert(node)
-            elif isinstance(node, A.Typedef):
-                self._typedef(node)
-            else:
-                self._global(node)
+            try:
+                self._external(node)
+            except CompileError as error:
+                self.errors.append(error)
+                del self.scopes.stack[1:]
+                self.function = None
+        if self.errors:
+            raise self.errors[0] if len(self.errors) == 1 else CompileErrors(self.errors)
         self.symbol_pragmas.settle(self._pragma_symbol)
+
+    def _external(self, node):
+        if isinstance(node, A.FuncDef):
+            self._function(node)
+        elif isinstance(node, A.Pragma):
+            self.pragma(node)
+        elif isinstance(node, A.StaticAssert):
+            self.static_assert(node)
+        elif isinstance(node, A.Typedef):
+            self._typedef(node)
+        else:
+            self._global(node)
 
     def _pragma_symbol(self, name):
         found = self.scopes.find(name)

@@ -154,6 +154,8 @@ class StaticInitializers(unittest.TestCase):
 class Errors(unittest.TestCase):
     CASES = [
         ("int f(void) { return y; }", "1:22: error: 'y' is not declared"),
+        ("int f(void) { x = 1; { int a; b = a; } return 0; }\nint g = 1;\nint g = 2;",
+         "1:15: error: 'x' is not declared\nt.c:1:31: error: 'b' is not declared\nt.c:3:5: error: redefinition of 'g'"),
         ("int f(void) {\n int a;\n  int a; }", "3:7: error: redefinition of 'a'"),
         ("int x = 1; int x = 2;", "1:16: error: redefinition of 'x'"),
         ("struct S { int a; }; int f(struct S s) { return s.b; }", "1:51: error: 'struct S' has no member 'b'"),
@@ -204,7 +206,7 @@ class Errors(unittest.TestCase):
             self.assertEqual((status, messages, os.path.exists(output)), (0, "", True))
             status, messages, output = compile_files(folder, ["int x = y;"])
             self.assertEqual((status, os.path.exists(output)), (1, False))
-            self.assertRegex(messages, r"p0\.c:1:9: error: 'y' is not declared\n$")
+            self.assertRegex(messages, r"p0\.c:1:9: error: 'y' is not declared\n    int x = y;\n            \^\n$")
 
 
 if __name__ == "__main__":

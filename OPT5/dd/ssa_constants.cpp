@@ -81,7 +81,7 @@ public:
 
     bool run(int number) {
         if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'do_1_CP_pass(%d)' ----------------\n", number);
-        has_changed = false;
+        has_changed = uses_are_counted = false;
         if (number > 1) find_copies();
         for (BBLK* bb : by_number)
             for (LIST* s = bb->statements; s; s = s->rest) {
@@ -90,12 +90,13 @@ public:
             }
         for (VALUE& v : values)
             if (v.is_copy) forget(v);
+        uses_are_counted &= !has_changed;
         return has_changed;
     }
 
     // `x = V`, where V has narrower bounds than x and reaches no phi: `y = V; x = y`, and y is read in place of x.
     bool name_bounded_values() {
-        count_uses();
+        if (!uses_are_counted) count_uses();
         int left = MOST_BOUNDED_VALUES;
         for (const SYM_RANGE* r = currfuninfo->widened; r; r = r->next) --left;
         bool any = false;
@@ -124,7 +125,9 @@ private:
 
     static void forget(VALUE& v) {
         if (v.tree) erase_tree(v.tree);
-        v = VALUE();
+        v.tree = nullptr;
+        v.is_copy = false;
+        v.sources.clear();
     }
 
     // ---- Candidates
@@ -241,6 +244,7 @@ private:
     }
 
     void count_uses() {
+        uses_are_counted = true;
         for (VALUE& v : values) v.uses = v.other = 0;
         for (BBLK* bb : by_number)
             for (LIST* s = bb->statements; s; s = s->rest) {
@@ -449,7 +453,7 @@ private:
     std::vector<std::pair<uint32_t, uint64_t>> saved;
     std::vector<size_t> marks;
     uint64_t last_state = 1;
-    bool has_changed = false, changed_here = false;
+    bool has_changed = false, changed_here = false, uses_are_counted = false;
     long line = 0;
 };
 

@@ -142,6 +142,7 @@ private:
     SSAVAR* var(size_t uid) const { return variables[uid].get(); }
     void enter_uses();
     void enter_use(SSA_SITE& site, int block);
+    void number_predecessors();
     void find_live_blocks();
     void find_live_blocks_of(SSAVAR* v, std::vector<uint32_t>& stamp);
     void place_chis();
@@ -164,6 +165,9 @@ private:
     int64_t definitions_left = MOST_SSA_DEFINITIONS + 4 * static_cast<int64_t>(build.sites.size()); // chis and phis
     int64_t live_left =
         8 * MOST_SSA_DEFINITIONS + 32 * static_cast<int64_t>(build.sites.size()); // entries of live sets
+    // Numbers of the predecessors, which are walked for each variable: those of block b from `first_before[b]` on.
+    std::vector<int> before_blocks;
+    std::vector<size_t> first_before;
     // While chis are placed: what is live, that which is memory as a list.
     std::vector<SSAVAR*> live_memory;
     std::vector<int32_t> place_of; // by variable: 0 dead, below 0 live, otherwise 1 + its place in `live_memory`
@@ -231,8 +235,8 @@ void BUILDER::find_live_blocks_of(SSAVAR* v, std::vector<uint32_t>& stamp) {
         before = e.block;
     }
     for (size_t i = 0; i < found.size(); ++i)
-        for (const EDGE* p = build.blocks[static_cast<size_t>(found[i])]->predecessors; p; p = p->rest) {
-            const int from = p->first->dfn;
+        for (size_t b = static_cast<size_t>(found[i]), k = first_before[b]; k < first_before[b + 1]; ++k) {
+            const int from = before_blocks[k];
             uint32_t& state = stamp[static_cast<size_t>(from)];
             if (state == defined || state == live) continue;
             state = live;
@@ -242,7 +246,17 @@ void BUILDER::find_live_blocks_of(SSAVAR* v, std::vector<uint32_t>& stamp) {
     for (int b : found) live_at_entry[static_cast<size_t>(b)].push_back(v->uid);
 }
 
+void BUILDER::number_predecessors() {
+    first_before.assign(block_count() + 1, 0);
+    for (size_t b = 1; b < block_count(); ++b) {
+        first_before[b] = before_blocks.size();
+        for (const EDGE* p = build.blocks[b]->predecessors; p; p = p->rest) before_blocks.push_back(p->first->dfn);
+    }
+    first_before[block_count()] = before_blocks.size();
+}
+
 void BUILDER::find_live_blocks() {
+    number_predecessors();
     std::vector<uint32_t> stamp(block_count(), 0);
     for (const auto& v : variables)
         if (live_left > 0 && !v->has(SSAVAR_munged)) find_live_blocks_of(v.get(), stamp);

@@ -48,7 +48,7 @@ const ROW rows[] = {
     {F,     "first fast_CP",               nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
     {FIXED, "scan definition",             nullptr, always, [] { preprocess_fundef(currfuninfo); }, none, graph},
     {FIXED, "call sites",                  nullptr, always, size_site_sets, none, fact::every},
-    {IDLE,  "parameters",                  nullptr, always, init_ipcp_for_fun, none, none},
+    {F,     "parameters",                  nullptr, always, init_ipcp_for_fun, none, fact::every},
     {IDLE,  "parameters by metavalues",    nullptr, [] { return do_IP_MVP; }, init_IP_MVP_for_current_function, none, none},
     {F,     "find local statics",          nullptr, always, identify_fl_statics_safe_for_auto, none, graph},
     {F,     "convert local statics",       nullptr, always, [] { convert_safe_fl_statics_to_auto(currfuninfo); }, none, graph},

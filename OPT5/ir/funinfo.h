@@ -88,13 +88,17 @@ struct EHT_ITEM {
 
 struct OVERLAP; // a record of the stack-sharing tree
 
-// A formal parameter, and what all calls together pass in it (OPT5/alias/points_to.h).
+// A formal parameter, and what all calls together pass in it.
 struct FPARM {
     enum STATE : uint8_t { NO_CALL, KNOWN, ANYTHING };
     std::string name;
     bool is_pointer;
     STATE state = NO_CALL;
-    std::shared_ptr<const PTENV> summary; // of a known pointer
+    std::shared_ptr<const PTENV> summary; // of a known pointer (OPT5/alias/points_to.h)
+    int kind = 0;              // 1: it has one value, `known`, and goes from the function and from all calls of it
+    const NODE* known = nullptr; // in the parameter's type, without a scope; never freed
+
+    FPARM(std::string n, bool pointer) : name(std::move(n)), is_pointer(pointer) {}
 };
 
 class FUNINFO : public serial_namespace<BBLK, FUNINFO> {

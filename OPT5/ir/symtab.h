@@ -101,6 +101,7 @@ public:
     bool fl_static_candidate = false;  // a function-local static that may become automatic
     bool fl_static_eligible = false;
     bool written_as_parameter = false; // entered the function as a parameter record
+    bool arg_needed = true; // a parameter: calls pass it
     bool is_clustered = false;
     bool lives_in_others = false; // its storage may lie in that of a symbol with `hosts_others`
     bool hosts_others = false;

@@ -71,7 +71,7 @@ static int keeping(int *p, int *q) {
 int main(void) {
     int i;
     for (i = 0; i < 20; i++) x[i] = i, y[i] = 100 - i, z[i] = i * i;
-    put_i16(scaled(y, x + 3, 2, 4)); put_i16(scaled(y + 5, z, 0, 9)); put_i16(passed_on(x + 1, 0, 5));
+    put_i16(scaled(y, x + 3, 2, 4)); put_i16(scaled(y + 5, z, 0, 9)); put_i16(passed_on(x + 1, 0, 5)); put_i16(passed_on(x, 1, 4));
     put_i16(meets_once(y, x, 3, 1)); put_i16(meets_once(z + 1, z + 1, 0, 2));
     put_i16(by_address(y, x, 2, 1)); put_i16(entry(x, x, 0, 7));
     put_i16(nested(&a, 5)); put_i16(keeping(&a, &b)); put_i16(keeping(kept, &b)); put_i16(keeping(&b, kept));

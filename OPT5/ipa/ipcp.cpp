@@ -13,6 +13,8 @@
 #include "OPT5/ipa/copy_cfg.h"
 #include "OPT5/ipa/known_calls.h"
 #include "OPT5/ipa/progana.h"
+#include "OPT5/ir/bblk.h"
+#include "OPT5/ir/facts.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
@@ -107,6 +109,8 @@ public:
     // The argument in terms of the parameters, with locals that hold one replaced.
     NODE* jump_function(const NODE* argument) const;
     bool takes_an_address() const { return address_taken; }
+    // How often the body names the parameter, or its local, besides in the prolog.
+    int reads_of(const SYMTAB* parm) const;
 
 private:
     void look(const NODE* tree);
@@ -114,11 +118,13 @@ private:
     std::unordered_map<const SYMTAB*, int> index;          // looked up
     std::unordered_map<const SYMTAB*, const NODE*> copies; // what the prolog gives a local; looked up
     std::unordered_set<const SYMTAB*> changed;             // or not known; membership only
+    std::unordered_map<const SYMTAB*, int> reads;          // looked up
     bool address_taken = false;
 };
 
 void PARAMETER_READS::look(const NODE* tree) {
     for_each_subtree(tree, [this](const NODE* t) {
+        if (t->op == NAME) ++reads[t->u.sym];
         const bool takes_address = t->op == UAND || t->op == ARGREF;
         if (!t->left || (!takes_address && !writes_left_operand(t->op))) return;
         const NODE* name = name_of_place(static_cast<const NODE*>(t->left));
@@ -143,6 +149,17 @@ PARAMETER_READS::PARAMETER_READS(const FUNINFO* f) {
         if (t->op == ASG && !local->type->is_volatile() && copies.emplace(local, t->right).second) return;
         changed.insert(local);
     });
+}
+
+int PARAMETER_READS::reads_of(const SYMTAB* parm) const {
+    auto of = [this](const SYMTAB* s) {
+        auto at = reads.find(s);
+        return at == reads.end() ? 0 : at->second;
+    };
+    int n = of(parm);
+    for (const auto& [local, value] : copies) // a sum
+        if (any_subtree(value, [parm](const NODE* t) { return t->op == NAME && t->u.sym == parm; })) n += of(local) - 1;
+    return n;
 }
 
 NODE* PARAMETER_READS::jump_function(const NODE* argument) const {
@@ -175,7 +192,7 @@ struct FORMAL {
     SYMTAB* parm = nullptr;
     LEVEL::KIND level = LEVEL::UNREADY;
     NODE* value = nullptr; // of ONE_VALUE; owned until it is given to the FPARM
-    bool may_go = false;
+    bool may_go = false, may_be_address = false;
     std::vector<size_t> supports; // the arguments that name it, by number
 };
 
@@ -232,11 +249,21 @@ bool SOLVER::fall(FORMAL& formal) const {
     return true;
 }
 
+bool has_back_edge(const FUNINFO* f) {
+    need(fact::block_numbers);
+    for (const BBLK* bb = f->bb_list; bb; bb = bb->dflink)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (e->first->dfn <= bb->dfn) return true;
+    return false;
+}
+
 void SOLVER::enter_functions() {
     for (FUNINFO* f : callers_first()) {
         if (f->formals.empty()) continue;
         functions.push_back(f);
+        const CURRENT current(f);
         const PARAMETER_READS reads(f);
+        const bool loops = has_back_edge(f);
         const bool may_beta = !TEST_FLAG(f, FUN_cannot_beta) && !reads.takes_an_address();
         std::vector<FORMAL>& list = formals[f];
         for (SYMTAB* s : parameters_in_order(*f)) {
@@ -244,6 +271,7 @@ void SOLVER::enter_functions() {
             formal.parm = s;
             formal.may_go = may_beta && s->sclass == SC_PARM && s->type->is_scalar() && !s->type->is_volatile() &&
                             !(s->cqual & CQ_GLOBAL_REGISTER) && !s->pragma && reads.index_of(s) >= 0;
+            formal.may_be_address = !loops && reads.reads_of(s) <= 1;
             if (!s->type->is_scalar() || s->type->is_volatile()) formal.level = LEVEL::ANYTHING;
             list.push_back(std::move(formal));
         }
@@ -380,6 +408,15 @@ void SOLVER::iterate() {
 
 // ---- The decision
 
+// A variable is cheaper to read than an address is to make: where it is read more often than once a call, the object stays
+// an argument. A function that is called by name tells more than one whose address is passed.
+bool is_worth_it(const FORMAL& formal) {
+    bool of_object = false;
+    for_each_subtree(static_cast<const NODE*>(formal.value),
+                     [&](const NODE* t) { of_object |= t->op == NAME && !t->u.sym->is_function(); });
+    return !of_object || formal.may_be_address;
+}
+
 void SOLVER::decide(FUNINFO* f) {
     std::vector<FORMAL>& list = formals.at(f);
     if (print_debug) print(f);
@@ -387,7 +424,7 @@ void SOLVER::decide(FUNINFO* f) {
     for (size_t i = 0; i < list.size(); ++i) {
         FORMAL& formal = list[i];
         if (formal.level != LEVEL::ONE_VALUE) continue;
-        if (!formal.may_go) {
+        if (!formal.may_go || !is_worth_it(formal)) {
             erase_tree(formal.value);
             continue;
         }

@@ -4,11 +4,12 @@
 #include <zrun.h>
 
 static int g[8] = {1, 2, 3, 4, 5, 6, 7, 8}, hits;
-int counter;
+int counter, cell;
 
-// The local copy still changes; constants of every kind.
+// The local copy still changes; constants of every kind. An address stays where it would be made in each iteration.
 // FUNCTION: loop
-// HAS: 0 k: int, class 17, qualifiers 0000, 16 bits aligned to 16, level 1
+// HAS: 0 p: int *, class 17, qualifiers 0000, 32 bits aligned to 32, level 1
+// HAS: 1 k: int, class 17, qualifiers 0000, 16 bits aligned to 16, level 1
 // HAS: end of arguments
 // NOT: class 17
 // HAS: pragma 39 MUST_ITERATE("8", "8", "8")
@@ -42,6 +43,16 @@ static int odd(int step, int n, int m) { return n <= 0 ? -m : even(step, n - 1, 
 static int effects(int a, int b) { return a * 3 + b; }
 #pragma FUNC_CANNOT_INLINE(next)
 static int next(void) { return ++counter; }
+
+// The address of an object that is read once, and of a function.
+// FUNCTION: once
+// HAS: /^function _once/
+// HAS: end of arguments
+// HAS: _cell = _twice(_cell)
+#pragma FUNC_CANNOT_INLINE(once)
+#pragma FUNC_CANNOT_INLINE(twice)
+static int twice(int n) { return n * 2 + 1; }
+static void once(int *to, int (*f)(int)) { cell = f(*to); }
 
 // No argument is left.
 // FUNCTION: alone
@@ -77,7 +88,7 @@ int main(void) {
     put_i16(r); put_i16(loop(8, g, one + 6, -1L, 2.5f));
     put_i16(even(3, one + 4, 9)); put_i16(odd(3, one + 7, 9));
     put_i16(effects(8 + 0 * next(), one)); put_i16(effects((put_i16(1), 8), one)); put_i16(effects(8, counter));
-    put_i16(alone(4)); if (one && alone(4) > 3) put_i16(alone(4));
+    once(&cell, twice); once(&cell, twice); put_i16(cell); put_i16(alone(4)); if (one && alone(4) > 3) put_i16(alone(4));
     put_i16(by_pointer(3)); put_i16(fp(one));
     put_i16(changes(2, one)); put_i16(takes_address(6)); put_i16(exported(7));
     return 0;

@@ -19,6 +19,7 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/vp/vp_eval.h"
 
 #include <algorithm>
 #include <deque>
@@ -193,6 +194,9 @@ struct FORMAL {
     LEVEL::KIND level = LEVEL::UNREADY;
     NODE* value = nullptr; // of ONE_VALUE; owned until it is given to the FPARM
     bool may_go = false, may_be_address = false;
+    vpset values;            // of an integer, as long as it is not empty: what the arguments so far may be
+    bool has_values = false; // it has not been given up
+    int widened = 0;
     std::vector<size_t> supports; // the arguments that name it, by number
 };
 
@@ -200,6 +204,7 @@ struct ARGUMENT {
     FUNINFO *caller, *callee;
     int number;       // of the parameter
     NODE* tree;       // the jump function, or null: anything. Owned
+    vpset range;      // without a jump function, of an integer
     std::string text; // for the debug stream
 };
 
@@ -217,6 +222,9 @@ private:
     void give_up(FUNINFO* callee);
     void iterate();
     bool meet(const ARGUMENT& a);
+    bool meet_trees(const ARGUMENT& a);
+    bool meet_values(const ARGUMENT& a);
+    bool values_of(const ARGUMENT& a, vpset* out) const;
     LEVEL::KIND evaluate(const ARGUMENT& a, NODE** value) const;
     FORMAL* formal_of(FUNINFO* f, const SYMTAB* parm);
     const FORMAL* formal_of(FUNINFO* f, const SYMTAB* parm) const { return const_cast<SOLVER*>(this)->formal_of(f, parm); }
@@ -271,6 +279,7 @@ void SOLVER::enter_functions() {
             formal.parm = s;
             formal.may_go = may_beta && s->sclass == SC_PARM && s->type->is_scalar() && !s->type->is_volatile() &&
                             !(s->cqual & CQ_GLOBAL_REGISTER) && !s->pragma && reads.index_of(s) >= 0;
+            formal.has_values = may_beta && has_value_range(s->type) && !s->type->is_volatile() && reads.index_of(s) >= 0;
             formal.may_be_address = !loops && reads.reads_of(s) <= 1;
             if (!s->type->is_scalar() || s->type->is_volatile()) formal.level = LEVEL::ANYTHING;
             list.push_back(std::move(formal));
@@ -283,7 +292,7 @@ void SOLVER::give_up(FUNINFO* callee) {
     set_flags(callee, FUN_cannot_beta);
     for (FORMAL& formal : formals[callee]) {
         fall(formal);
-        formal.may_go = false;
+        formal.may_go = formal.has_values = false;
     }
 }
 
@@ -304,8 +313,8 @@ void SOLVER::link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS&
         FORMAL& formal = at->second[i];
         const bool by_value = formal.parm->type->is_scalar() && passed->op != ARGREF;
         if (by_value && passed->type->size != formal.parm->type->size) give_up(callee);
-        ARGUMENT a{caller, callee, static_cast<int>(i), nullptr, {}};
-        if (by_value && formal.level != LEVEL::ANYTHING && kinds_agree(passed->type, formal.parm->type)) a.tree = reads.jump_function(passed);
+        ARGUMENT a{caller, callee, static_cast<int>(i), nullptr, {}, {}};
+        if (by_value && kinds_agree(passed->type, formal.parm->type)) a.tree = reads.jump_function(passed);
         if (print_debug) {
             a.text = text_of(passed);
             print_argument("Linking", a);
@@ -315,6 +324,11 @@ void SOLVER::link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS&
                 debug_printf(", parm %s\n[Bottoming tree for %s]\n", formal.parm->name, formal.parm->name);
         }
         if (!a.tree) fall(formal);
+        if (!a.tree && by_value && has_vpset(passed->type)) {
+            init_vpenv_allocation({}, 0);
+            a.range = vpset_of_tree(passed, vpenv());
+            erase_all_vpenvs();
+        }
         if (a.tree)
             for_each_subtree(static_cast<const NODE*>(a.tree), [&](const NODE* t) {
                 if (t->op != NAME || t->u.sym->level != 1) return;
@@ -361,11 +375,10 @@ LEVEL::KIND SOLVER::evaluate(const ARGUMENT& a, NODE** value) const {
     return *value ? LEVEL::ONE_VALUE : LEVEL::ANYTHING;
 }
 
-// Whether the formal changed.
-bool SOLVER::meet(const ARGUMENT& a) {
+// Whether the formal's one value changed.
+bool SOLVER::meet_trees(const ARGUMENT& a) {
     FORMAL& formal = formals.at(a.callee)[static_cast<size_t>(a.number)];
     if (formal.level == LEVEL::ANYTHING) return false;
-    const CURRENT current(a.caller);
     NODE* value = nullptr;
     const LEVEL::KIND level = evaluate(a, &value);
     if (print_debug) {
@@ -387,6 +400,63 @@ bool SOLVER::meet(const ARGUMENT& a) {
     const bool same = trees_are_congruent(formal.value, value, false);
     erase_tree(value);
     return !same && fall(formal);
+}
+
+// Where the caller's parameters are not known yet, the argument waits for them.
+bool SOLVER::values_of(const ARGUMENT& a, vpset* out) const {
+    if (!a.tree) {
+        *out = a.range;
+        return true;
+    }
+    std::vector<SYMTAB*> parameters;
+    auto at = formals.find(a.caller);
+    if (at != formals.end())
+        for (const FORMAL& f : at->second)
+            if (f.has_values) parameters.push_back(f.parm);
+    bool is_ready = true;
+    init_vpenv_allocation(parameters, parameters.size());
+    vpenv env;
+    for_each_subtree(static_cast<const NODE*>(a.tree), [&](const NODE* t) {
+        const FORMAL* f = t->op == NAME && t->u.sym->level == 1 ? formal_of(a.caller, t->u.sym) : nullptr;
+        if (!f || !f->has_values) return;
+        is_ready &= !vpset_is_empty(f->values);
+        env = assign_vpset_in_vpenv(f->parm, f->values, env);
+    });
+    if (is_ready) {
+        eval_expr_in_vpenv(out, a.tree, nullptr, env, 0);
+        if (print_debug && env != vpenv()) dump_vpenv(env, "VPENV for aarg:\n");
+    }
+    erase_all_vpenvs();
+    return is_ready;
+}
+
+// Whether the formal's values changed. What keeps growing is widened to one slice, to all that its step reaches, and to
+// anything.
+bool SOLVER::meet_values(const ARGUMENT& a) {
+    constexpr int TO_ONE_SLICE = 3, TO_ALL_STEPS = 5, TO_ANYTHING = 8;
+    FORMAL& formal = formals.at(a.callee)[static_cast<size_t>(a.number)];
+    vpset passed;
+    if (!formal.has_values || !values_of(a, &passed)) return false;
+    const TYPE* type = formal.parm->type;
+    truncate_vpset_to_type(&passed, type);
+    vpset all = passed;
+    if (!vpset_is_empty(passed) && !vpset_is_empty(formal.values)) vpset_union(&all, formal.values, passed);
+    if (!vpset_is_empty(passed) && vpset_equal(all, formal.values)) return false;
+    if (++formal.widened > TO_ONE_SLICE && !vpset_is_empty(all)) {
+        VPSLICE hull;
+        vpset_compress(&hull, all);
+        all = vpset(hull);
+        if (formal.widened > TO_ALL_STEPS && hull.step) include_incr_in_vpset(hull.step, &all, type);
+    }
+    formal.has_values = !vpset_is_empty(passed) && formal.widened <= TO_ANYTHING && !vpset_is_bottom(all, type);
+    formal.values = formal.has_values ? all : vpset();
+    return true;
+}
+
+bool SOLVER::meet(const ARGUMENT& a) {
+    const CURRENT current(a.caller);
+    const bool changed = meet_trees(a);
+    return meet_values(a) || changed;
 }
 
 void SOLVER::iterate() {
@@ -423,6 +493,7 @@ void SOLVER::decide(FUNINFO* f) {
     bool any = false;
     for (size_t i = 0; i < list.size(); ++i) {
         FORMAL& formal = list[i];
+        if (formal.has_values && !vpset_is_empty(formal.values)) enter_vpset_of_formal_parm(f, formal.parm->name, formal.values);
         if (formal.level != LEVEL::ONE_VALUE) continue;
         if (!formal.may_go || !is_worth_it(formal)) {
             erase_tree(formal.value);
@@ -444,7 +515,8 @@ void SOLVER::print(FUNINFO* f) const {
     debug_printf("\n\tParameters for function %s() [IPCP?=%d]\n", f->name.c_str(), !TEST_FLAG(f, FUN_cannot_beta));
     for (size_t i = 0; i < list.size(); ++i) {
         const FORMAL& formal = list[i];
-        debug_printf("\t  #%ld %s (level %c)\tVP info: %s\n", static_cast<long>(i), formal.parm->name, formal.level, "");
+        debug_printf("\t  #%ld %s (level %c)\tVP info: %s\n", static_cast<long>(i), formal.parm->name, formal.level,
+                     vpset2string(formal.values).c_str());
         if (formal.value) debug_printf("\n\t\t\ttree: %s\n", text_of(formal.value).c_str());
         for (size_t n : formal.supports) {
             const ARGUMENT& a = arguments[n];

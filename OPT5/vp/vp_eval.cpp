@@ -139,6 +139,9 @@ private:
         case NAME: {
             const int number = number_of_name(t);
             const vpset* known = number < 0 ? nullptr : vpenv_store->find(env, number);
+            vpset passed;
+            if (!known && t->u.sym && t->type->stqs() == t->u.sym->type->stqs() && find_vpset_in_formal_parms(&passed, t->u.sym))
+                return passed;
             return known ? *known : plain_range(t);
         }
         case COMMAOP: return as_type(of(t->right), t->right, t->type);
@@ -595,12 +598,22 @@ vpset VP_EFFECT::value(vpenv env) const {
     return s;
 }
 
+// An argument prolog gives each local the value of its parameter.
+vpenv VP_EFFECT::with_parameters(vpenv env) const {
+    for_each_subtree(tree, [&env](const NODE* t) {
+        if (t->op != ASG || !tree_is_arg_prolog(t) || number_of_name(t->left) < 0) return;
+        env = vpenv_store->bind(env, number_of_name(t->left), VP_EFFECT(t).value(env));
+    });
+    return env;
+}
+
 vpenv VP_EFFECT::behind(vpenv env, bool exclusive) const {
     env = during(env);
     if (asserted) {
         vpenv narrowed = env;
         if (filter_vpenv(&narrowed, asserted, true)) env = narrowed;
     }
+    if (tree->op == PCOMMA) return with_parameters(env);
     if (target < 0) return env;
     const vpset s = value(env);
     return exclusive ? vpenv_store->bind_exclusively(env, target, s) : vpenv_store->bind(env, target, s);

@@ -33,6 +33,7 @@ public:
 
 private:
     vpset value(vpenv env) const;
+    vpenv with_parameters(vpenv env) const;
 
     const NODE* tree;
     const NODE* asserted = nullptr; // a condition that holds from here on
@@ -40,6 +41,11 @@ private:
     std::vector<int> lost;          // symbols that are written besides
     bool loses_globals = false;
 };
+
+// ---- vp_formals.cpp. Of a parameter that its function only reads, in the parameter's type
+void enter_vpset_of_formal_parm(const class FUNINFO* f, const std::string& parm, const vpset& set);
+// What all calls pass in the parameter of the current function, if that is known.
+bool find_vpset_in_formal_parms(vpset* out, const SYMTAB* sym);
 
 // While it lives, bounds of trees take in what the environment says.
 class VALUES_AT : VARIABLE_VALUES {

@@ -54,6 +54,27 @@ static int next(void) { return ++counter; }
 static int twice(int n) { return n * 2 + 1; }
 static void once(int *to, int (*f)(int)) { cell = f(*to); }
 
+// Few values: what is known of them settles tests, remainders and trip counts.
+// FUNCTION: ranged
+// HAS: pragma 39 MUST_ITERATE("1", "15", "1")
+// NOT: 99
+// NOT: %
+#pragma FUNC_CANNOT_INLINE(ranged)
+static int ranged(int n, int k) {
+    int s = 0, i;
+    for (i = 0; i < n; i++) s += g[i & 7] * (k % 4);
+    if (n > 20) s = 99;
+    return s;
+}
+// FUNCTION: upward
+// NOT: -5
+#pragma FUNC_CANNOT_INLINE(upward)
+static int upward(int d, int m) { return d > m ? d : d < 0 ? -5 : upward(d + 3, m) + 1; }
+// FUNCTION: downward
+// COUNT 1: -5
+#pragma FUNC_CANNOT_INLINE(downward)
+static int downward(int d, int m) { return d < m ? d : d < 0 ? -5 : downward(d - 3, m) + 1; }
+
 // No argument is left.
 // FUNCTION: alone
 // HAS: /^function _alone/
@@ -88,7 +109,9 @@ int main(void) {
     put_i16(r); put_i16(loop(8, g, one + 6, -1L, 2.5f));
     put_i16(even(3, one + 4, 9)); put_i16(odd(3, one + 7, 9));
     put_i16(effects(8 + 0 * next(), one)); put_i16(effects((put_i16(1), 8), one)); put_i16(effects(8, counter));
-    once(&cell, twice); once(&cell, twice); put_i16(cell); put_i16(alone(4)); if (one && alone(4) > 3) put_i16(alone(4));
+    once(&cell, twice); once(&cell, twice); put_i16(cell); put_i16(ranged(one & 15, 9)); put_i16(ranged(one & 3, one & 15));
+    put_i16(upward(0, one + 30)); put_i16(upward(4, one)); put_i16(downward(7, one - 30));
+    put_i16(alone(4)); if (one && alone(4) > 3) put_i16(alone(4));
     put_i16(by_pointer(3)); put_i16(fp(one));
     put_i16(changes(2, one)); put_i16(takes_address(6)); put_i16(exported(7));
     return 0;

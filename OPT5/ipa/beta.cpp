@@ -63,9 +63,12 @@ NODE* without_known(NODE* list, const FUNINFO* callee, NODE** effects) {
     return kept;
 }
 
-void report_result(const FUNINFO* callee, const NODE* call, const NODE* tree) {
+void report_result(FUNINFO* callee, const NODE* call, const NODE* tree) {
     if (call != tree || call->type->is_void() || !write_opt_info) return;
-    info_printf("\t*** %s()'s return value discarded: %s\n", callee->name.c_str(), tree_to_infix(tree).c_str());
+    if (TEST_FLAG(callee, FUN_value_needed))
+        info_printf("\t*** %s()'s return value discarded: %s\n", callee->name.c_str(), tree_to_infix(tree).c_str());
+    else
+        info_printf("\t*** %s()'s return value is not needed:\n", callee->name.c_str());
 }
 
 // The call without the arguments that its callee no longer has.

@@ -262,6 +262,13 @@ ITERATE_PROMISE joined(const ITERATE_PROMISE& a, const ITERATE_PROMISE& b) {
 
 } // namespace
 
+// Of a loop that is left before its tail those iterations are bounded that are executed to their ends. Once its other exits are
+// gone it may be left from its tail, where the last one counts, too: the promise stays with it.
+static bool may_count_one_more(const struct LOOP* loop, INT65 max) {
+    const bool is_of_tail = loop->is_bottom_tested() && is_icon(loop->trips) && loop->trips->u.lval == max;
+    return loop->has(LOOP_early_exit) && !is_of_tail && loop->head->statements->rest;
+}
+
 ITERATE_PROMISE promise_of_MUST_ITERATE(const NODE* pragma) {
     ITERATE_PROMISE p;
     p.min = max_of(get_PPRAGMA_tree_int_arg(pragma, 0), INT65(0));
@@ -280,6 +287,7 @@ void try_to_make_MUST_ITERATE_pragma(struct LOOP* loop) {
     const bool has_min = exact && is_icon(loop->minTrips), has_factor = exact && is_icon(loop->tripFactor);
     INT65 max = is_icon(loop->maxTrips) ? min_of(loop->maxTrips->u.lval, no_trip_bound()) : no_trip_bound();
     if (max <= INT65(0)) max = no_trip_bound(); // that of a loop that has no iteration
+    if (max != no_trip_bound() && may_count_one_more(loop, max)) max += INT65(1);
     const bool says_something = (has_min && loop->minTrips->u.lval > INT65(1)) || max != no_trip_bound() ||
                                 (has_factor && loop->tripFactor->u.lval > INT65(1));
     if (!says_something) return;
@@ -341,8 +349,9 @@ void reconcile_MUST_ITERATE_pragma(struct LOOP* loop) {
         }
         both = proved;
     }
-    write_promise(loop->mustIterate, both);
     set_icon(&loop->maxTrips, both.max);
+    if (both.max < stated.max && may_count_one_more(loop, both.max)) both.max += INT65(1);
+    write_promise(loop->mustIterate, both);
     if (loop->has(LOOP_early_exit)) return;
     set_icon(&loop->minTrips, both.min);
     set_icon(&loop->tripFactor, both.multiple);

@@ -100,6 +100,20 @@ int read_by_the_next(int n) {
     return s;
 }
 
+// Left from within its sixth iteration, which is the last one of the loop that remains.
+// FUNCTION: left_within
+// HAS: /MUST_ITERATE\("0", "6", "1"\)/
+// COUNT 1: goto
+long left_within(const long *p) {
+    long acc = 1;
+    int i = 0;
+    do {
+        acc -= *++p * 3;
+        if (i == 5) break;
+    } while (++i < 15);
+    return acc;
+}
+
 int main(void) {
     for (int i = 0; i < 8; i++) g[i] = i * i;
     put_i32(two_loops(8));
@@ -110,5 +124,7 @@ int main(void) {
     put_i16(g[3]);
     put_i32(left_at_once(5, 0) + left_at_once(4, 1) + never_run(3));
     put_i16(read_by_the_next(3));
+    static const long many[16] = {0, 1, 2, 3, 4, 5, 6, 7};
+    put_i32(left_within(many));
     return 0;
 }

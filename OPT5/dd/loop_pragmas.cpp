@@ -266,7 +266,7 @@ ITERATE_PROMISE joined(const ITERATE_PROMISE& a, const ITERATE_PROMISE& b) {
 // gone it may be left from its tail, where the last one counts, too: the promise stays with it.
 static bool may_count_one_more(const struct LOOP* loop, INT65 max) {
     const bool is_of_tail = loop->is_bottom_tested() && is_icon(loop->trips) && loop->trips->u.lval == max;
-    return loop->has(LOOP_early_exit) && !is_of_tail && loop->head->statements->rest;
+    return loop->has(LOOP_early_exit) && !is_of_tail && loop->head && loop->head->statements->rest;
 }
 
 ITERATE_PROMISE promise_of_MUST_ITERATE(const NODE* pragma) {

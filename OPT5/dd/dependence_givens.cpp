@@ -53,7 +53,7 @@ bool modular(const NODE* left, WIDE r, RELATION* relation) {
     return true;
 }
 
-// Inverts `r` where it is of the difference the other way; false where it is of another one.
+// Inverts `r` where it is of the negated difference; false where it is of another one.
 bool align(const RELATION& a, RELATION* r) {
     const auto same = [](const NODE* x, const NODE* y) { return x == y || (x && y && is_same_value(x, y)); };
     if (same(a.left, r->left) && same(a.right, r->right)) return true;

@@ -10,7 +10,7 @@
 // Needs: normal form, the hierarchy with its counts. Leaves: where anything was converted, a graph for which the
 // hierarchy is built anew; promises and counts speak of the new iterations. Sound because every second test would have
 // been true, and the sum is regrouped in arithmetic that wraps. Both addresses move by a whole word an iteration, so
-// that the first one decides about all. On a big-endian memory the halves lie the other way about.
+// that the first one decides about all. On a big-endian memory the halves are exchanged.
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/alias.h"

@@ -26,6 +26,7 @@
 
 #include <algorithm>
 #include <string>
+#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -107,10 +108,16 @@ bool may_be_late(const BBLK* bb, const LIST* cell) {
 
 // ---- Squares
 
-int count_of(const SYMTAB* sym, const NODE* t) {
-    int count = 0;
-    for_each_subtree(t, [&](const NODE* n) { count += n->op == NAME && n->u.sym == sym; });
-    return count;
+using MENTIONS = std::unordered_map<const SYMTAB*, int>; // looked up alone
+
+MENTIONS mentions_of_variables() {
+    MENTIONS found;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            for_each_subtree(static_cast<const NODE*>(s->first), [&found](const NODE* n) {
+                if (n->op == NAME) ++found[n->u.sym];
+            });
+    return found;
 }
 
 // A variable that the tree multiplies by itself.
@@ -127,7 +134,8 @@ const SYMTAB* squared_variable(const NODE* t) {
 }
 
 // `s = *x; acc += s * s;`, as a load that is needed twice was kept: the hardware squares what it loads.
-void read_square_from_memory(BBLK* bb) {
+// `mentions` is found where it is asked for first: what rotations add names no such variable.
+void read_square_from_memory(BBLK* bb, MENTIONS& mentions) {
     for (LIST** link = &bb->statements; (*link)->rest && (*link)->rest->rest; link = &(*link)->rest) {
         const NODE* load = (*link)->first;
         NODE* t = (*link)->rest->first;
@@ -138,11 +146,12 @@ void read_square_from_memory(BBLK* bb) {
         if (squared_variable(t->right) != sym || !is_a_likely_zelkova_register(sym) ||
             lvalue_is_volatile(load->right) || !equiv_mtypes(load->left->type, load->right->type))
             continue;
-        int elsewhere = -1 - count_of(sym, t);
-        for (const BBLK* other = currfuninfo->bb_list; other; other = other->dflink)
-            for (const LIST* s = other->statements; s; s = s->rest) elsewhere += count_of(sym, s->first);
-        if (elsewhere != 0 || count_of(sym, t) != 2) continue;
+        if (mentions.empty()) mentions = mentions_of_variables();
         NODE* name = mk_NAME(sym);
+        if (mentions[sym] != 3 || count_lvalues_in_tree(t, name) != 2) { // the load, and both factors
+            erase_tree(name);
+            continue;
+        }
         NODE* square = copy_tree(t);
         square->right = subst_tree_for_lvalue_in_tree(load->right, name, square->right);
         erase_tree(name);
@@ -180,7 +189,8 @@ std::string why_not_rotated(BBLK* bb, const LIST* cell, int products) {
     if (!why.empty()) return why;
     if (ROTATION r; !find_rotation(bb, &r)) return "the loop has more than one block: take if, ?: and calls out of it";
     if (!multiplies_once(bb))
-        return "there are " + std::to_string(products) + " multiplications an iteration and one multiplier: make a loop of each sum";
+        return "there are " + std::to_string(products) +
+               " multiplications an iteration and one multiplier: make a loop of each sum";
     if (!may_be_late(bb, cell)) return "the loop reads or changes the sum elsewhere";
     return "the hardware has no instruction for this product";
 }
@@ -188,7 +198,8 @@ std::string why_not_rotated(BBLK* bb, const LIST* cell, int products) {
 bool multiplies_loaded(const NODE* t) {
     const auto is_loaded = [](const NODE* n) { return n->op == UMULT; };
     return any_subtree(t, [&](const NODE* n) {
-        return n->op == MULT && n->right->op != ICON && (any_subtree(n->left, is_loaded) || any_subtree(n->right, is_loaded));
+        return n->op == MULT && n->right->op != ICON &&
+               (any_subtree(n->left, is_loaded) || any_subtree(n->right, is_loaded));
     });
 }
 
@@ -212,7 +223,8 @@ void tell_of_block(BBLK* bb) {
         is_told = true;
     }
     if (!is_told && first)
-        remark(PASS, first->psn, REMARK::NOTE, std::to_string(products) + " multiplications an iteration, none of them added to a sum");
+        remark(PASS, first->psn, REMARK::NOTE,
+               std::to_string(products) + " multiplications an iteration, none of them added to a sum");
 }
 
 // ---- The rotation
@@ -225,33 +237,26 @@ NODE* neutral(const NODE* accumulation) {
     return is_negative ? fold_constants(maketree(UMINUS, zero, nullptr, type)) : zero;
 }
 
-LIST* copy_of_statement(const LIST* cell) {
-    LIST* copy = mkelist(copy_tree(cell->first), nullptr, cell->psn);
-    return copy;
-}
-
 class ROTATOR {
 public:
-    bool run();
+    void run();
 
 private:
-    bool rotate(ROTATION& r);
-    bool rotate(ROTATION& r, LIST* cell);
+    void rotate(ROTATION& r);
+    void rotate(ROTATION& r, LIST* cell);
 
+    MENTIONS mentions;
     bool has_new_temps = false, has_new_blocks = false;
 };
 
 // The statement becomes `acc op= t` and `t = product`, or the call of both.
-bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
-    LIST* pair = copy_of_statement(cell);
-    const SYMTAB* temp = split_out_multiply(pair);
-    if (!temp) {
-        erase_tree_list(pair);
-        return false;
-    }
+void ROTATOR::rotate(ROTATION& r, LIST* cell) {
+    LIST* pair = mkelist(copy_tree(cell->first), nullptr, cell->psn);
+    SYMTAB* temp = split_out_multiply(pair);
+    if (!temp) return erase_tree_list(pair);
     std::swap(pair->first, pair->rest->first);
     NODE* late = copy_tree(pair->first);
-    NODE* zero = mk_ASG(mk_NAME(const_cast<SYMTAB*>(temp)), neutral(late));
+    NODE* zero = mk_ASG(mk_NAME(temp), neutral(late));
     const bool is_call = conversion_to_BIF_call_succeeds(pair, false);
     // Where no instruction does both, an addition beside the multiplication is a gain for the floating-point unit
     // alone.
@@ -259,7 +264,7 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
         erase_tree_list(pair);
         erase_tree(late);
         erase_tree(zero);
-        return false;
+        return;
     }
     erase_tree(cell->first);
     cell->first = std::exchange(pair->first, nullptr);
@@ -273,32 +278,27 @@ bool ROTATOR::rotate(ROTATION& r, LIST* cell) {
     }
     insert_before(&r.exit->statements, late, cell->psn);
     has_new_temps = true;
-    return is_call;
 }
 
-bool ROTATOR::rotate(ROTATION& r) {
-    bool any = false;
+void ROTATOR::rotate(ROTATION& r) {
     split_accumulations_in_bb(r.block);
-    read_square_from_memory(r.block);
+    read_square_from_memory(r.block, mentions);
     for (LIST* s = r.block->statements; s->rest; s = s->rest)
-        if (is_mac(s->first) && may_be_late(r.block, s)) any |= rotate(r, s);
-    return any;
+        if (is_mac(s->first) && may_be_late(r.block, s)) rotate(r, s);
 }
 
-bool ROTATOR::run() {
+void ROTATOR::run() {
     std::vector<BBLK*> blocks;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
     for (BBLK* bb : blocks) {
         ROTATION r;
-        if (!find_rotation(bb, &r) || !multiplies_once(bb)) continue;
-        if (!pass_disable_simple_rotation && rotate(r)) continue;
+        if (!pass_disable_simple_rotation && find_rotation(bb, &r) && multiplies_once(bb)) rotate(r);
     }
     if (remarks_are_wanted)
         for (BBLK* bb : blocks)
             if (is_in_cycle(bb)) tell_of_block(bb);
     if (has_new_temps) sym_split(currfuninfo);
     changed(has_new_blocks ? fact::none : fact::graph);
-    return has_new_temps;
 }
 
 } // namespace

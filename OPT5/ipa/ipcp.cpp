@@ -43,19 +43,13 @@ void init_ipcp_for_fun() {
 
 // ---- Jump functions
 
-// The object under an address, or the tree.
-static const NODE* addressed_object(const NODE* t) {
-    while (t->op == STDOT) t = t->left;
-    return t;
-}
-
 bool arg_is_valid_jump_function(const NODE* t) {
     for (; t; t = t->left) {
         if (t->type->is_csu() || op_has_effect(t->op)) return false;
         switch (t->op) {
         case NAME: return t->u.sym && t->u.sym->level == 1 && !t->type->is_volatile() && !t->u.sym->type->is_volatile();
         case UAND: {
-            const NODE* object = addressed_object(t->left);
+            const NODE* object = without_members(static_cast<const NODE*>(t->left));
             return object->op == NAME && expr_is_globally_evaluable(object);
         }
         case UMULT: // may have been written since

@@ -15,7 +15,7 @@
 enum class REMARK : uint8_t {
     DONE,
     MISSED, // the programmer may change it
-    NOTE,   // what was found out on the way
+    NOTE,   // what was found out besides
 };
 
 // Ask ahead of making a text: where nobody reads remarks they cost this test.

@@ -571,7 +571,7 @@ void GLOBAL_CSE::apply(const EXPRESSION& e, const TRIPLE& t) {
     }
 }
 
-// Only the edges that a computation is put on are split: a block of its own on any other would be in the way of what
+// Only the edges that a computation is put on are split: a block of its own on any other would hinder what
 // follows.
 void GLOBAL_CSE::insert_useful_blocks() {
     for (auto& [edge, assignments] : on_edges) {

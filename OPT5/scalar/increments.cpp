@@ -101,8 +101,8 @@ public:
         case QUEST: return both(of(t->left, is_conditional), of(t->right, true));
         case IF:
         case SWITCH: return of(t->left, is_conditional);
-        case UAND:                                                  // an address, no access
-        case ASSERT:                                                // nor need these be evaluated
+        case UAND:   // an address, no access
+        case ASSERT: // nor need these be evaluated
         case NASSERT: return without_hit(of(t->left, is_conditional));
         case UMULT:
             if (!t->right && absorbs(t)) return is_conditional ? USE{USE::BLOCKED, nullptr} : USE{USE::HIT, t};
@@ -295,11 +295,13 @@ bool INCREMENTS::moves_backward(size_t at, BBLK* bb, NODE* tree, const STEP& ste
 
 void INCREMENTS::sweep_backward(BBLK* bb) {
     for (size_t i = cells_of(bb).size(); i-- > 0;) {
-        LIST* cell = cells_of(bb)[i]; // a split adds one in front
+        LIST* cell = cells_of(bb)[i];
         NODE* t = cell->first;
         STEP step;
+        const size_t before = cells_of(bb).size();
         if (read_step(t, &step) && is_in_register(step.p, false)) {
             if (moves_backward(i, bb, t, step)) cell->first = nullptr;
+            i += cells_of(bb).size() - before; // what a split added stands in front
             continue;
         }
         // x = (p = p + c)
@@ -307,6 +309,7 @@ void INCREMENTS::sweep_backward(BBLK* bb) {
                                  t->right->op != PLUSPLUS && t->right->op != MINMIN && is_in_register(step.p, true);
         if (!is_embedded || t->left->u.sym == step.p) continue;
         if (moves_backward(i, bb, t->right, step)) t->right = mk_NAME(step.p);
+        i += cells_of(bb).size() - before;
     }
     cells[static_cast<size_t>(bb->dfn)].clear();
     drop_empty_cells(&bb->statements);
@@ -475,19 +478,13 @@ struct FOLDED {
     STEP step;
 };
 
-int count_of(const SYMTAB* p, const NODE* t) {
-    int count = 0;
-    for_each_subtree(t, [&](const NODE* n) { count += n->op == NAME && n->u.sym == p; });
-    return count;
-}
-
 // Those of a statement that are evaluated whenever it is, and whose pointer nothing else in it reads.
 void find_folded(NODE* t, const NODE* statement, std::vector<FOLDED>& found) {
     if (!t) return;
     STEP step;
     if (has_own_step(t, &step)) {
         const int own = t->left->op == ASG ? 2 : 1;
-        if (count_of(step.p, statement) == own) found.push_back({t, step});
+        if (count_lvalues_in_tree(statement, t->left->left) == own) found.push_back({t, step});
         return;
     }
     find_folded(t->left, statement, found);

@@ -131,12 +131,8 @@ NODE* GLOBAL_ASGS::lookup_global_ASG(NODE* name) {
     report_replacement("\n\t============== (%ld) 'lookup_global_ASG' is replacing this:\n",
                        "\n\t============== with the following substitute:\n",
                        "\n\t=============================================\n", name, value);
-    NODE* substitute = copy_tree(value);
-    substitute->ls = name->ls;
-    substitute = coerce_to_type(name->type->stqs(), substitute);
-    erase_tree(name);
     any = true;
-    return substitute;
+    return value_in_place_of(name, value);
 }
 
 NODE* GLOBAL_ASGS::read(NODE* t) {

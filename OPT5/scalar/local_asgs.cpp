@@ -61,6 +61,14 @@ void report_replacement(const char* head, const char* middle, const char* end, c
     debug_printf("%s\n%s%s\n%s", tree_to_infix(old).c_str(), middle, tree_to_infix(value).c_str(), end);
 }
 
+NODE* value_in_place_of(NODE* name, const NODE* value) {
+    NODE* substitute = copy_tree(value);
+    substitute->ls = name->ls;
+    substitute = coerce_to_type(name->type->stqs(), substitute);
+    erase_tree(name);
+    return substitute;
+}
+
 namespace {
 
 void report_local_replacement(const char* head, const NODE* old, const NODE* value) {
@@ -151,12 +159,8 @@ NODE* LOCAL_ASGS::lookup_ASG(NODE* name) {
     if (known.value->op == NAME && known.source_depnum != depnums[known.value->u.sym]) return name;
     if (in_test && known.value->op == NAME) return name;
     report_local_replacement("\n\t========== (%ld) 'lookup_ASG' is replacing this:\n", name, known.value);
-    NODE* value = copy_tree(known.value);
-    value->ls = name->ls;
-    value = coerce_to_type(name->type->stqs(), value);
-    erase_tree(name);
     any = true;
-    return value;
+    return value_in_place_of(name, known.value);
 }
 
 NODE* LOCAL_ASGS::read_names(NODE* t) {

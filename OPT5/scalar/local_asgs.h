@@ -23,6 +23,8 @@ bool ok_to_propagate_for_pointer(const NODE* value, const NODE* target);
 
 // What propagation reports of each replacement in its dump: `head` takes the number of the replacement.
 void report_replacement(const char* head, const char* middle, const char* end, const NODE* old, const NODE* value);
+// A copy of the value in the type of the name, whose tree it takes the place of and erases.
+NODE* value_in_place_of(NODE* name, const NODE* value);
 
 class LOCAL_ASGS {
 public:

@@ -3,8 +3,7 @@
 // Blocks are evaluated in reverse postorder, those again whose entry has changed, in at most 12 passes. An edge carries
 // the exit environment of its block narrowed by the test there; an edge that no value passes carries nothing. What
 // enters a block is what holds on all edges into it. A set that still grows where a back edge enters is widened, after
-// the fifth member, to the end of its type in the direction it grows in; the loop's test narrows it again on the way
-// round.
+// the fifth member, to the end of its type in the direction it grows in; the loop's test narrows it again.
 //
 // Needs: block numbers, alias marks; caps need trip counts of the loop hierarchy. Leaves: everything: it only looks.
 // Sound because only a state that a whole pass did not change is used: the first block's entry binds nothing, each

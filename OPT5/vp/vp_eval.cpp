@@ -2,7 +2,7 @@
 //
 // Sound because each operator gives a superset of what the target computes from members of its operands' sets. A signed
 // sum, difference, product or negation is the number itself (OPT5/simp/exact.h), so that what lies beyond the type is
-// left out; all else wraps. Of a variable that the tree writes on the way nothing is taken: its environment has no
+// left out; all else wraps. Of a variable that the tree itself writes nothing is taken: its environment has no
 // binding of it then (VP_EFFECT::during). A walk looks at a bounded number of nodes; what it does not see has any value.
 #include "OPT5/vp/vp_eval.h"
 

@@ -24,7 +24,7 @@ public:
     bool is_none() const { return target < 0 && lost.empty() && !asserted && !loses_globals; }
     // `exclusive`: the environment is changed in place.
     vpenv behind(vpenv env, bool exclusive) const;
-    // What the parts of the statement may rely on while it is evaluated: nothing that it writes on the way.
+    // What the parts of the statement may rely on while it is evaluated: nothing that it writes itself.
     vpenv during(vpenv env) const;
     const std::vector<int>& lost_symbols() const { return lost; }
     int assigned_symbol() const { return target; } // -1 without

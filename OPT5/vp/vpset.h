@@ -21,7 +21,7 @@ struct VPSLICE {
     bool operator==(const VPSLICE& o) const { return low == o.low && high == o.high && step == o.step; }
 };
 
-// Slices on their way to a set.
+// Slices that become a set.
 class VPSLICE_LIST {
 public:
     static constexpr int MOST = 10; // one more merges those that are there

@@ -5,7 +5,7 @@
 
 int x[100], h;
 
-// A sum of at most 100 amounts of 1 or 2 is 300 at no time; on the way there it is 50 once.
+// A sum of at most 100 amounts of 1 or 2 is 300 at no time; before that it is 50 once.
 // FUNCTION: accumulated
 // COUNT 1: _h += 1
 // COUNT 0: _h += 100

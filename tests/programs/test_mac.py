@@ -71,7 +71,7 @@ REFUSED = {  # what a loop does beside, or in place of, what the hardware does
 # In a unified memory: the loop, and the call.
 DUAL = {
     "long acc = 5; for (i = 0; i < 64; i++) acc += (long)h[i] * k[i];": "dmac",
-    "long acc = 5; for (i = 63; i >= 0; i--) acc += (long)h[i] * k[i];": "mpy_add",  # the words' halves are the wrong way about
+    "long acc = 5; for (i = 63; i >= 0; i--) acc += (long)h[i] * k[i];": "mpy_add",  # the words' halves are exchanged
     "long acc = 5; for (i = 1; i < 65; i++) acc += (long)h[i] * k[i];": "mpy_add",
     "long acc = 5; for (i = 0; i < 63; i++) acc += (long)h[i] * k[i];": "mpy_add",
     "long acc = 5; for (i = 0; i < n; i++) acc += (long)h[i] * k[i];": "mpy_add",

@@ -1,6 +1,8 @@
 // Sets of progressions against explicit sets: no operation loses a member, and those that are exact gain none.
 #include "OPT5/vp/vpset.h"
 
+#include "../ir/function_fixture.h"
+
 #include "OPT5/ir/opcodes.h"
 #include "OPT5/ir/type_ops.h"
 
@@ -13,16 +15,8 @@ namespace {
 
 using MEMBERS = std::set<int>;
 
-class VPSET : public ::testing::Test {
+class VPSET : public FunctionTest {
 protected:
-    static void SetUpTestSuite() {
-        if (tp) return;
-        tp = new TYPE_PKG;
-        TYPE_PKG::init_type_pkg(tp);
-        init_opcode_tables();
-        init_types();
-    }
-
     int below(int n) { return std::uniform_int_distribution<int>(0, n - 1)(random); }
 
     VPSLICE slice() {

@@ -121,7 +121,7 @@ private:
     void visit(NODE** link, bool is_conditional);
     void definition(CANDIDATE* c, NODE* assignment);
     void push(CANDIDATE* c, EVENT::KIND kind, NODE** link = nullptr, bool is_conditional = false) {
-        c->events.push_back({kind, block, order, cell, link, is_conditional});
+        c->events.push_back({{kind, block, order, is_conditional}, cell, link});
     }
 
     std::vector<CANDIDATE*> by_uid;
@@ -210,7 +210,7 @@ public:
     LOAD_PROMOTER(const MOTION_GRAPH& graph, const std::vector<int>& first_stop, PROMOTION_TEMPS& temps,
                   const FREQUENCIES& frequencies, bool benign)
         : graph(graph), first_stop(first_stop), temps(temps), frequencies(frequencies), benign(benign),
-          loops(*currfuninfo->loops) {}
+          loops(*currfuninfo->loops), is_dead_end(dead_ends(graph, loops)) {}
     void run(const std::vector<CANDIDATE*>& batch, bool is_global);
     // What the batches decided: assignments take their places.
     bool finish();
@@ -218,12 +218,9 @@ public:
 private:
     void prepare_sets();
     void fill_sets(size_t k);
-    void fill_block(size_t k, size_t begin, size_t end);
     void add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted, const std::vector<CANDIDATES>& known);
     const BBLK* place_ahead(const CANDIDATE& c, const EVENT& use, const NATURAL_LOOP* loop) const;
     void decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known);
-    bool decide_reads(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& known, VALUE_LIFE& life);
-    void decide_saves(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end);
     double gain_of(size_t k, const INSERTIONS& inserted, const VALUE_LIFE& life,
                    const std::vector<CANDIDATES>& live) const;
     bool store_may_leave_loop(const CANDIDATE& c, const EVENT& def) const;
@@ -235,13 +232,6 @@ private:
     NODE* load(CANDIDATE& c) {
         return mk_ASG(mk_NAME(temps.of(c)), copy_tree(c.reference, false));
     }
-    template <class F>
-    static void for_each_block(CANDIDATE& c, F&& visit) {
-        for (size_t begin = 0, end; begin < c.events.size(); begin = end) {
-            for (end = begin + 1; end < c.events.size() && c.events[end].block == c.events[begin].block;) ++end;
-            visit(c.events[begin].block, begin, end);
-        }
-    }
 
     const MOTION_GRAPH& graph;
     const std::vector<int>& first_stop;
@@ -249,6 +239,7 @@ private:
     const FREQUENCIES& frequencies;
     const bool benign;
     const NATURAL_LOOPS& loops;
+    const std::vector<bool> is_dead_end;
     std::vector<CANDIDATE*> batch;
     std::unique_ptr<MOTION> motion;
     std::unordered_map<const LIST*, std::vector<NODE*>> ahead; // statements to come ahead of one; looked up, never walked
@@ -257,34 +248,12 @@ private:
     bool any = false;
 };
 
-void LOAD_PROMOTER::fill_block(size_t k, size_t begin, size_t end) {
-    const CANDIDATE& c = *batch[k];
-    const CANDIDATES bit = CANDIDATES(1) << k;
-    const size_t b = c.events[begin].block;
-    MOTION_SETS& s = motion->sets[b];
-    bool is_changed = false;
-    for (size_t i = begin; i < end; ++i) {
-        const EVENT& e = c.events[i];
-        if (e.kind == EVENT::USE) {
-            if (e.is_conditional) continue;
-            if (!is_changed && !(c.may_trap() && e.order > first_stop[b])) s.first |= bit;
-            s.last |= bit;
-            continue;
-        }
-        is_changed = true;
-        s.demands &= ~bit;
-        s.passes &= ~bit;
-        if (e.kind == EVENT::DEF)
-            s.last |= bit;
-        else
-            s.last &= ~bit;
-    }
-}
-
 void LOAD_PROMOTER::fill_sets(size_t k) {
     CANDIDATE& c = *batch[k];
     const CANDIDATES bit = CANDIDATES(1) << k;
-    for_each_block(c, [&](size_t, size_t begin, size_t end) { fill_block(k, begin, end); });
+    for_each_block(c.events, [&](size_t b, size_t begin, size_t end) {
+        motion->enter_block(bit, c.events, begin, end, c.may_trap() ? first_stop[b] : INT32_MAX);
+    });
     for (size_t header : c.cut) motion->sets[header].cut |= bit;
 }
 
@@ -296,7 +265,7 @@ void LOAD_PROMOTER::prepare_sets() {
         if (batch[k]->may_trap()) trapping |= CANDIDATES(1) << k;
     for (size_t b : graph.order) {
         motion->sets[b].passes = ~CANDIDATES(0);
-        motion->sets[b].demands = first_stop[b] != INT32_MAX ? ~trapping : ~CANDIDATES(0);
+        motion->sets[b].demands = first_stop[b] != INT32_MAX || is_dead_end[b] ? ~trapping : ~CANDIDATES(0);
     }
     for (size_t k = 0; k < batch.size(); ++k) fill_sets(k);
 }
@@ -346,7 +315,7 @@ void LOAD_PROMOTER::add_benign_loads(size_t k, const std::vector<CANDIDATES>& wa
     std::sort(places.begin(), places.end());
     places.erase(std::unique(places.begin(), places.end()), places.end());
     for (size_t at : places) {
-        EVENT load{EVENT::USE, at, INT32_MAX, nullptr, nullptr};
+        EVENT load{{EVENT::USE, at, INT32_MAX, false, true}, nullptr, nullptr};
         c.events.insert(std::upper_bound(c.events.begin(), c.events.end(), load,
                                          [](const EVENT& a, const EVENT& b) { return a.block < b.block; }),
                         load);
@@ -367,56 +336,18 @@ void LOAD_PROMOTER::run(const std::vector<CANDIDATE*>& candidates, bool is_globa
     decide(inserted, motion->available(inserted));
 }
 
-// Which reads have their value, and so go.
-bool LOAD_PROMOTER::decide_reads(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& known, VALUE_LIFE& life) {
-    bool any_deleted = false;
-    for_each_block(c, [&](size_t b, size_t begin, size_t end) {
-        bool is_known = known[b] & bit, is_local = false, is_set = false;
-        for (size_t i = begin; i < end; ++i) {
-            EVENT& e = c.events[i];
-            if (e.kind == EVENT::USE) {
-                e.is_deleted = is_known;
-                e.is_local = is_local;
-                any_deleted |= is_known && e.link;
-                if (is_known && e.link && !is_set) life.reads[b] |= bit;
-                if (e.is_conditional || is_known) continue;
-            }
-            is_known = e.kind != EVENT::KILL;
-            is_local = is_set = true;
-        }
-        if (is_set) life.sets[b] |= bit;
-    });
-    return any_deleted;
-}
-
-// Which loads and stores set the temporary: those whose value is read from it.
-void LOAD_PROMOTER::decide_saves(CANDIDATE& c, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end) {
-    for_each_block(c, [&](size_t b, size_t begin, size_t end) {
-        bool is_live = live_at_end[b] & bit;
-        for (size_t i = end; i-- > begin;) {
-            EVENT& e = c.events[i];
-            if (e.kind == EVENT::USE && e.is_deleted)
-                is_live |= e.link != nullptr;
-            else if (!e.is_conditional) {
-                e.is_saved = is_live && e.kind != EVENT::KILL;
-                is_live = false;
-            }
-        }
-    });
-}
-
 void LOAD_PROMOTER::decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known) {
     VALUE_LIFE life(*motion);
     CANDIDATES changed = 0;
     for (size_t k = 0; k < batch.size(); ++k)
-        if (decide_reads(*batch[k], CANDIDATES(1) << k, known, life)) changed |= CANDIDATES(1) << k;
+        if (decide_reads(batch[k]->events, CANDIDATES(1) << k, known, life)) changed |= CANDIDATES(1) << k;
     if (!changed) return;
     life.edge_sets = inserted;
     const std::vector<CANDIDATES> live = life.live_at_end(graph);
     for (size_t k = 0; k < batch.size(); ++k) {
         const CANDIDATES bit = CANDIDATES(1) << k;
         if (!(changed & bit)) continue;
-        decide_saves(*batch[k], bit, live);
+        decide_saves(batch[k]->events, bit, live);
         if (gain_of(k, inserted, life, live) < 0) {
             changed &= ~bit;
             continue;

@@ -1,7 +1,7 @@
 // What the two halves of register promotion share: candidates, and the temporaries that hold their values.
 #pragma once
 
-#include "OPT5/dd/code_motion.h"
+#include "OPT5/ir/code_motion.h"
 #include "OPT5/dd/ssa.h"
 #include "OPT5/ir/list.h"
 
@@ -12,18 +12,10 @@ class NATURAL_LOOPS;
 struct NATURAL_LOOP;
 class FREQUENCIES;
 
-// A place where a candidate is accessed, or where what it holds may change.
-struct PROMOTION_EVENT {
-    enum KIND : uint8_t { USE, DEF, KILL };
-    KIND kind;
-    size_t block;
-    int order;     // of the statement in its block
-    LIST* cell;    // the statement; null: a load that is to be made at the end of the block
-    NODE** link;   // of a USE: holds the SSA_USE
-    bool is_conditional = false; // it is not certain that the statement evaluates it
-    bool is_step = false;        // the read of the compound assignment that the next event is
-    // What was decided.
-    bool is_deleted = false, is_saved = false, is_local = false;
+struct PROMOTION_EVENT : MOTION_EVENT {
+    LIST* cell;  // the statement; null: of a new load
+    NODE** link; // of a USE: holds the SSA_USE
+    bool is_step = false; // the read of the compound assignment that the next event is
 };
 
 struct PROMOTION_CANDIDATE {

@@ -78,7 +78,6 @@ private:
     bool touches(const NODE* tree, size_t& number, const STORED& s);
     void find_points(STORED& s);
     std::vector<size_t> statements_around(const SSAVAR* v) const;
-    void find_dead_ends();
     void spare_registers();
     void promote(std::vector<STORED*> stored);
     void fill_sets(MOTION& motion) const;
@@ -88,13 +87,6 @@ private:
     VALUE_LIFE life_of(const MOTION& motion, const INSERTIONS& inserted) const;
     void rewrite(STORED& s, CANDIDATES bit, const std::vector<CANDIDATES>& live);
     void rewrite_store(STORED& s, POINT& p);
-    template <class F>
-    static void for_each_block(const STORED& s, F&& visit) {
-        for (size_t begin = 0, end; begin < s.points.size(); begin = end) {
-            for (end = begin + 1; end < s.points.size() && s.points[end].block == s.points[begin].block;) ++end;
-            visit(s.points[begin].block, begin, end);
-        }
-    }
 
     PROMOTION_TEMPS& temps;
     const MOTION_GRAPH backward, forward;
@@ -204,35 +196,6 @@ void STORE_PROMOTER::find_points(STORED& s) {
     }
 }
 
-bool has_no_exit(const NATURAL_LOOP& loop, const NATURAL_LOOPS& loops) {
-    for (const BBLK* bb : loop.blocks)
-        for (const EDGE* e = bb->successors; e; e = e->rest)
-            if (!loops.contains(&loop, e->first)) return false;
-    return true;
-}
-
-// A path that never comes to a return would overwrite everything: it ends at the header of the loop that has no exit, or,
-// where cycles are no natural loops, wherever no return is reached.
-void STORE_PROMOTER::find_dead_ends() {
-    is_dead_end.assign(forward.blocks.size(), false);
-    std::vector<bool> returns(forward.blocks.size(), false);
-    std::vector<size_t> waiting;
-    auto enter = [&](size_t b) {
-        if (!returns[b]) waiting.push_back(b);
-        returns[b] = true;
-    };
-    for (size_t b : forward.order)
-        if (forward.after[b].empty()) enter(b);
-    for (size_t i = 0; i < waiting.size(); ++i)
-        for (size_t p : forward.before[waiting[i]]) enter(p);
-    for (size_t b : forward.order) {
-        if (returns[b]) continue;
-        const NATURAL_LOOP* loop = loops.around(forward.blocks[b]);
-        const bool is_header = loop && loop->header == forward.blocks[b];
-        is_dead_end[b] = loops.has_other_cycles() || (is_header && has_no_exit(*loop, loops));
-    }
-}
-
 void STORE_PROMOTER::spare_registers() {
     std::unordered_map<const NATURAL_LOOP*, size_t> values; // looked up, never walked
     size_t kept = 0;
@@ -257,7 +220,7 @@ void STORE_PROMOTER::fill_sets(MOTION& motion) const {
         motion.sets[b].passes = motion.sets[b].demands = through;
     }
     for (size_t k = 0; k < batch.size(); ++k)
-        for_each_block(*batch[k], [&](size_t b, size_t begin, size_t end) {
+        for_each_block(batch[k]->points, [&](size_t b, size_t begin, size_t end) {
             const CANDIDATES bit = CANDIDATES(1) << k;
             MOTION_SETS& s = motion.sets[b];
             if (is_dead_end[b]) return;
@@ -282,7 +245,7 @@ void STORE_PROMOTER::drop_poor_insertions(const MOTION& motion, INSERTIONS& inse
                 if (inserted[b][i] & bit)
                     made += frequencies.of_edge(backward.blocks[b], backward.blocks[backward.before[b][i]]);
         if (made == 0) continue;
-        for_each_block(*batch[k], [&](size_t b, size_t, size_t end) {
+        for_each_block(batch[k]->points, [&](size_t b, size_t, size_t end) {
             if (batch[k]->points[end - 1].cell && overwritten[b] & bit) gone += frequencies.of(backward.blocks[b]);
         });
         if (gone >= LEAST_GAIN * made) continue;
@@ -293,7 +256,7 @@ void STORE_PROMOTER::drop_poor_insertions(const MOTION& motion, INSERTIONS& inse
 
 void STORE_PROMOTER::mark_deleted(size_t k, const std::vector<CANDIDATES>& overwritten) {
     STORED& s = *batch[k];
-    for_each_block(s, [&](size_t b, size_t begin, size_t end) {
+    for_each_block(s.points, [&](size_t b, size_t begin, size_t end) {
         bool is_overwritten = overwritten[b] >> k & 1;
         for (size_t i = end; i-- > begin;) {
             POINT& p = s.points[i];
@@ -383,7 +346,7 @@ void STORE_PROMOTER::rewrite_store(STORED& s, POINT& p) {
 }
 
 void STORE_PROMOTER::rewrite(STORED& s, CANDIDATES bit, const std::vector<CANDIDATES>& live) {
-    for_each_block(s, [&](size_t b, size_t begin, size_t end) {
+    for_each_block(s.points, [&](size_t b, size_t begin, size_t end) {
         bool is_live = live[b] & bit;
         for (size_t i = end; i-- > begin;) {
             POINT& p = s.points[i];
@@ -410,7 +373,7 @@ bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidat
     summarize();
     find_stored(candidates);
     if (all.empty()) return false;
-    find_dead_ends();
+    is_dead_end = dead_ends(forward, loops);
     size_t known = 0;
     for (; known < all.size() && questions_left > 0; ++known) find_points(all[known]);
     all.resize(known, {nullptr, {}});

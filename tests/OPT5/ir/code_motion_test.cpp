@@ -1,5 +1,5 @@
 // Placement of accesses on random graphs: what is counted on random paths must agree with what the equations say.
-#include "OPT5/dd/code_motion.h"
+#include "OPT5/ir/code_motion.h"
 
 #include <gtest/gtest.h>
 

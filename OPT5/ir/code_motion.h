@@ -33,6 +33,11 @@ struct MOTION_GRAPH {
     std::vector<size_t> order;
 };
 
+// By block, of the graph seen forward: nothing behind it is certain to come. A path that never comes to an end of the
+// function could be said to contain anything: it is cut at the header of the loop that has no exit or, where cycles are no
+// natural loops, wherever no end is reached.
+std::vector<bool> dead_ends(const MOTION_GRAPH& forward, const NATURAL_LOOPS& loops);
+
 // What a block does to the candidates, between its start and its end in the direction of the motion.
 struct MOTION_SETS {
     CANDIDATES first = 0;   // has an occurrence that could stand at the start
@@ -46,10 +51,38 @@ struct MOTION_SETS {
 // By the block at the end of an edge and its place among what is before that.
 using INSERTIONS = std::vector<std::vector<CANDIDATES>>;
 
+// A place where a candidate occurs, or where what it stands for may change.
+struct MOTION_EVENT {
+    enum KIND : uint8_t { USE, DEF, KILL };
+    KIND kind;
+    size_t block;
+    int order;                   // of the statement in its block
+    bool is_conditional = false; // it is not certain that the statement evaluates it
+    bool is_new = false;         // a use that is not there yet, to be made at the end of the block
+    // What was decided. Local: by what the block itself does ahead of it.
+    bool is_deleted = false, is_saved = false, is_local = false;
+};
+
+// The events, in the order of blocks, a block at a time: `visit(block, begin, end)`.
+template <class EVENTS, class F>
+void for_each_block(const EVENTS& events, F&& visit) {
+    for (size_t begin = 0, end; begin < events.size(); begin = end) {
+        for (end = begin + 1; end < events.size() && events[end].block == events[begin].block;) ++end;
+        visit(events[begin].block, begin, end);
+    }
+}
+
+struct VALUE_LIFE;
+
 class MOTION {
 public:
     explicit MOTION(const MOTION_GRAPH& graph);
     std::vector<MOTION_SETS> sets; // by block; filled by the caller, but for what the graph closes
+
+    // Enters the events of a block. What may trap does not move ahead of a statement of the order `first_stop` or later,
+    // which may not pass control on.
+    template <class EVENTS>
+    void enter_block(CANDIDATES bit, const EVENTS& events, size_t begin, size_t end, int first_stop);
 
     // An occurrence is certain to follow each start of a block, before anything that bars it.
     std::vector<CANDIDATES> anticipated() const;
@@ -77,6 +110,68 @@ struct VALUE_LIFE {
     // The reads still to come at the end of each block, of a graph that is seen forward.
     std::vector<CANDIDATES> live_at_end(const MOTION_GRAPH& graph) const;
 };
+
+template <class EVENTS>
+void MOTION::enter_block(CANDIDATES bit, const EVENTS& events, size_t begin, size_t end, int first_stop) {
+    MOTION_SETS& s = sets[events[begin].block];
+    bool is_changed = false;
+    for (size_t i = begin; i < end; ++i) {
+        const MOTION_EVENT& e = events[i];
+        if (e.kind == MOTION_EVENT::USE) {
+            if (e.is_conditional) continue;
+            if (!is_changed && e.order <= first_stop) s.first |= bit;
+            s.last |= bit;
+            continue;
+        }
+        is_changed = true;
+        s.demands &= ~bit;
+        s.passes &= ~bit;
+        if (e.kind == MOTION_EVENT::DEF)
+            s.last |= bit;
+        else
+            s.last &= ~bit;
+    }
+}
+
+// Which uses have their value, and so are deleted. Whether any is that was there.
+template <class EVENTS>
+bool decide_reads(EVENTS& events, CANDIDATES bit, const std::vector<CANDIDATES>& known, VALUE_LIFE& life) {
+    bool any_deleted = false;
+    for_each_block(events, [&](size_t b, size_t begin, size_t end) {
+        bool is_known = known[b] & bit, is_local = false, is_set = false;
+        for (size_t i = begin; i < end; ++i) {
+            MOTION_EVENT& e = events[i];
+            if (e.kind == MOTION_EVENT::USE) {
+                e.is_deleted = is_known;
+                e.is_local = is_local;
+                any_deleted |= is_known && !e.is_new;
+                if (is_known && !e.is_new && !is_set) life.reads[b] |= bit;
+                if (e.is_conditional || is_known) continue;
+            }
+            is_known = e.kind != MOTION_EVENT::KILL;
+            is_local = is_set = true;
+        }
+        if (is_set) life.sets[b] |= bit;
+    });
+    return any_deleted;
+}
+
+// Which occurrences set the temporary: those whose value is read from it.
+template <class EVENTS>
+void decide_saves(EVENTS& events, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end) {
+    for_each_block(events, [&](size_t b, size_t begin, size_t end) {
+        bool is_live = live_at_end[b] & bit;
+        for (size_t i = end; i-- > begin;) {
+            MOTION_EVENT& e = events[i];
+            if (e.kind == MOTION_EVENT::USE && e.is_deleted)
+                is_live |= !e.is_new;
+            else if (!e.is_conditional) {
+                e.is_saved = is_live && e.kind != MOTION_EVENT::KILL;
+                is_live = false;
+            }
+        }
+    });
+}
 
 // Statements on edges, put where they run if control takes the edge: at the end of the block before, at the start of
 // the block behind, or in a block of their own.

@@ -1,4 +1,4 @@
-#include "OPT5/dd/code_motion.h"
+#include "OPT5/ir/code_motion.h"
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
@@ -52,6 +52,33 @@ MOTION_GRAPH::MOTION_GRAPH(const std::vector<std::vector<size_t>>& graph)
         order.push_back(b);
         for (size_t next : graph[b]) before[next].push_back(b);
     }
+}
+
+static bool has_no_exit(const NATURAL_LOOP& loop, const NATURAL_LOOPS& loops) {
+    for (const BBLK* bb : loop.blocks)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (!loops.contains(&loop, e->first)) return false;
+    return true;
+}
+
+std::vector<bool> dead_ends(const MOTION_GRAPH& forward, const NATURAL_LOOPS& loops) {
+    std::vector<bool> found(forward.blocks.size(), false), ends(forward.blocks.size(), false);
+    std::vector<size_t> waiting;
+    auto enter = [&](size_t b) {
+        if (!ends[b]) waiting.push_back(b);
+        ends[b] = true;
+    };
+    for (size_t b : forward.order)
+        if (forward.after[b].empty()) enter(b);
+    for (size_t i = 0; i < waiting.size(); ++i)
+        for (size_t p : forward.before[waiting[i]]) enter(p);
+    for (size_t b : forward.order) {
+        if (ends[b]) continue;
+        const NATURAL_LOOP* loop = loops.around(forward.blocks[b]);
+        const bool is_header = loop && loop->header == forward.blocks[b];
+        found[b] = loops.has_other_cycles() || (is_header && has_no_exit(*loop, loops));
+    }
+    return found;
 }
 
 MOTION::MOTION(const MOTION_GRAPH& graph) : sets(graph.blocks.size()), graph(graph) {

@@ -524,7 +524,7 @@ bool LOAD_PROMOTER::finish() {
                 pragmas = link;
         }
     }
-    on_edges.insert();
+    on_edges.insert_useful_blocks();
     return any;
 }
 

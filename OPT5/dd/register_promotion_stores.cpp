@@ -386,7 +386,7 @@ bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidat
         for (size_t k = i; k < std::min(i + MOST_CANDIDATES, all.size()); ++k) some.push_back(&all[k]);
         promote(std::move(some));
     }
-    on_edges.insert();
+    on_edges.insert_useful_blocks();
     return any;
 }
 

@@ -96,6 +96,7 @@ std::vector<CANDIDATES> MOTION::anticipated() const {
     std::vector<CANDIDATES> at_start(graph.blocks.size(), ALL);
     for (bool changed = true; changed;) {
         changed = false;
+        if (print_debug >= 2) debug_printf("\n\tNext iteration of global ANTIN/ANTOUT loop\n");
         for (auto b = graph.order.rbegin(); b != graph.order.rend(); ++b) {
             CANDIDATES at_end = graph.after[*b].empty() ? 0 : ALL;
             for (size_t next : graph.after[*b]) at_end &= at_start[next];
@@ -112,6 +113,7 @@ std::vector<CANDIDATES> MOTION::available(const INSERTIONS& inserted) const {
     std::vector<CANDIDATES> at_start(graph.blocks.size(), ALL);
     for (bool changed = true; changed;) {
         changed = false;
+        if (print_debug >= 2) debug_printf("\n\tNext iteration of global AVIN/AVOUT loop\n");
         for (size_t b : graph.order) {
             CANDIDATES now = graph.before[b].empty() ? 0 : ALL;
             for (size_t k = 0; k < graph.before[b].size(); ++k) {
@@ -146,6 +148,7 @@ INSERTIONS MOTION::latest_insertions() const {
     };
     for (bool changed = true; changed;) {
         changed = false;
+        if (print_debug >= 2) debug_printf("\n\tNext iteration of global PPIN/PPOUT loop\n");
         for (size_t b : graph.order) {
             CANDIDATES now = graph.before[b].empty() ? wanted[b] : ALL;
             for (size_t k = 0; k < edges[b].size(); ++k) now &= behind(b, k);
@@ -217,8 +220,8 @@ bool EDGE_STATEMENTS::may_insert(BBLK* from, BBLK* to) {
 
 void EDGE_STATEMENTS::add(BBLK* from, BBLK* to, NODE* statement) { all.push_back({from, to, statement}); }
 
-void EDGE_STATEMENTS::insert() {
-    if (all.empty()) return;
+bool EDGE_STATEMENTS::insert_useful_blocks() {
+    if (all.empty()) return false;
     std::stable_sort(all.begin(), all.end(), [](const ENTRY& a, const ENTRY& b) {
         return a.from->dfn != b.from->dfn ? a.from->dfn < b.from->dfn : a.to->dfn < b.to->dfn;
     });
@@ -247,4 +250,5 @@ void EDGE_STATEMENTS::insert() {
     }
     if (has_split) renumber_bblocks();
     all.clear();
+    return has_split;
 }

@@ -181,8 +181,8 @@ public:
     // promise and its loop.
     static bool may_insert(BBLK* from, BBLK* to);
     void add(BBLK* from, BBLK* to, NODE* statement);
-    // Puts all of them in. The numbers of blocks are right behind it.
-    void insert();
+    // Puts all of them in. True if that took blocks of their own; the numbers of blocks are right then.
+    bool insert_useful_blocks();
     bool empty() const { return all.empty(); }
 
 private:

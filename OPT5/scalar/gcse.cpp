@@ -12,15 +12,17 @@
 // control on counts as a change for what may trap), and is taken away only where all paths have it in the temporary.
 // Edges that exceptions take, and those out of a block that ends in their dispatch, get no computation.
 //
-// Every expression is looked at by itself, in the blocks that it reaches: sets of all expressions for all blocks would
-// take the square of the function's size. What a block does to an expression is asked when it is reached, and the number
-// of blocks that all expressions may reach is limited, so that time stays linear.
+// What a block does to an expression is asked when some path brings the expression there, and the number of blocks that
+// all expressions may reach is limited, so that time stays linear: sets of all expressions for all blocks would take the
+// square of the function's size. Those for which that leaves something to gain are placed, many at a time, by the
+// equations that register promotion uses for its loads (code_motion.h); elsewhere they count as changed.
 //
 // Sources: E. Morel, C. Renvoise, "Global Optimization by Suppression of Partial Redundancies", 1979; D. M. Dhamdhere,
 // "Practical Adaptation of the Global Optimization Algorithm of Morel and Renvoise", 1991 (insertion on edges).
 #include "OPT5/scalar/gcse.h"
 
 #include "OPT5/alias/effects.h"
+#include "OPT5/ir/code_motion.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/frequencies.h"
 #include "OPT5/ir/funinfo.h"
@@ -34,7 +36,8 @@
 #include "OPT5/scalar/triples.h"
 
 #include <algorithm>
-#include <map>
+#include <deque>
+#include <memory>
 #include <numeric>
 #include <unordered_map>
 #include <unordered_set>
@@ -42,95 +45,69 @@
 namespace {
 
 // What is known of one expression in one block.
-enum FACT_BIT : uint16_t {
-    ANTLOC = 1,   // computed ahead of any change
-    AVLOC = 2,    // computed behind all changes
-    ALTERED = 4,  // changed
-    STAYS = 8,    // may trap, and control may not pass through
-    PAVIN = 16,   // some path to the entry computes it
-    AVIN = 32,    // all do
-    PPIN = 64,    // it is in the temporary on entry
-    NEEDED = 128, // the temporary's value is needed at the exit
-    SEEN = 256,
-    EXPOSED = 512, // as ANTLOC, whether or not control passes through
-    REACHED = 1024,
+enum FACT_BIT : uint8_t {
+    AVLOC = 1,   // computed behind all changes
+    ALTERED = 2, // changed
+    STAYS = 4,   // may trap, and control may not pass through
+    PAVIN = 8,   // some path to the entry computes it
+    REACHED = 16,
+};
+
+struct EVENT : MOTION_EVENT {
+    const TRIPLE_SITE* site; // null where the expression changes
+};
+
+// What all expressions of a function share.
+struct FUNCTION {
+    FUNCTION() : graph(false), is_dead_end(dead_ends(graph, *currfuninfo->loops)), facts(graph.blocks.size(), 0) {}
+
+    const MOTION_GRAPH graph;
+    const std::vector<bool> is_dead_end; // by block
+    std::vector<uint8_t> facts; // by block; 0 between expressions
+    FREQUENCIES runs;
+    int64_t questions_left = 100000; // about writes to memory; beyond them every write is taken to change it
+    int64_t blocks_left = 4000000;   // to be reached; beyond them expressions stay where they are
 };
 
 class EXPRESSION {
 public:
-    // What all expressions of a function share.
-    struct FUNCTION {
-        std::vector<BBLK*> blocks;   // by number
-        std::vector<uint16_t> facts; // by block; 0 between expressions
-        std::vector<bool> is_endless; // by block: control reaches no end of the function from there
-        FREQUENCIES runs;
-        int64_t questions_left = 100000; // about writes to memory; beyond them every write is taken to change it
-        int64_t blocks_left = 4000000;   // to be reached; beyond them expressions stay where they are
-    };
-    EXPRESSION(const TRIPLE& t, FUNCTION& function)
-        : t(t), facts(function.facts), blocks(function.blocks), function(function) {}
-    ~EXPRESSION() { forget(); }
-    // Whether it pays; fills what is to be done.
-    bool decide();
-    // Whether all paths to what is taken away compute it, before anything is done; reports where not.
-    bool is_given_where_deleted(int number);
-    void dump_annotations(int number);
+    EXPRESSION(TRIPLE& t, int number, FUNCTION& function) : t(t), number(number), function(function) {}
+    // Whether some path to where it is computed has computed it before. What it does in blocks is known then.
+    bool may_be_redundant();
+    void enter(MOTION& motion, CANDIDATES bit) const;
 
-    struct EDGE_PLACE {
-        BBLK *from, *to;
-    };
-    std::vector<BBLK*> insert_at_end;
-    std::vector<EDGE_PLACE> insert_on_edge;
-    std::vector<const TRIPLE_SITE*> replace; // the temporary has the value
-    std::vector<const TRIPLE_SITE*> save;    // computed into the temporary
+    TRIPLE& t;
+    const int number;
+    std::vector<EVENT> events; // by block and place
 
 private:
     // The first and last change in a block, by position; 0: there is none.
     struct CHANGES {
         int first = 0, last = 0;
     };
-    uint16_t& at(int block) {
-        uint16_t& f = facts[static_cast<size_t>(block)];
+    struct BLOCK {
+        int block;
+        uint8_t facts;
+    };
+    uint8_t& at(int block) {
+        uint8_t& f = function.facts[static_cast<size_t>(block)];
         if (f == 0) reach(block, first_change(block));
         return f;
     }
-    uint16_t& at(const BBLK* bb) { return at(bb->dfn); }
     void reach(int block, int change);
-    void forget();
     int first_change(int block);
     int last_change(int block);
     bool changes_it(const TRIPLE_WRITE& w);
-    BBLK* bb(int block) const { return blocks[static_cast<size_t>(block)]; }
-    bool is_available_at_exit(const BBLK* b) {
-        const uint16_t f = at(b);
-        return (f & AVLOC) || ((f & AVIN) && !(f & ALTERED));
-    }
-    bool is_placed_at_exit(const BBLK* b);
-    bool is_placed_through(const BBLK* b) { return (at(b) & PPIN) && !(at(b) & (ALTERED | STAYS)); }
-    bool is_redundant_in(int block) {
-        const uint16_t f = at(block);
-        return (f & (ANTLOC | PPIN)) == (ANTLOC | PPIN) || (f & (EXPOSED | AVIN)) == (EXPOSED | AVIN);
-    }
-    static bool edge_takes_computation(const BBLK* from, const BBLK* to);
-    static bool end_takes_computation(const BBLK* b);
 
     void find_local_facts();
-    void compute_PAVIN();
-    bool may_be_redundant();
-    void compute_AVOUT();
-    void compute_PPIN();
-    bool may_be_placed(const BBLK* b);
-    void compute_INSERT();
-    void find_saves();
-    bool pays() const;
+    void enter_sites(size_t begin, size_t end, CHANGES c);
+    bool compute_PAVIN();
+    bool is_partially_available();
 
-    const TRIPLE& t;
-    std::vector<uint16_t>& facts; // by block; 0 but for what `touched` lists
-    const std::vector<BBLK*>& blocks;
     FUNCTION& function;
     bool with_memory = false; // writes to memory count
-    std::vector<int> touched, region;
-    std::unordered_map<int, CHANGES> changes; // of the blocks of its sites; looked up alone
+    std::vector<int> touched;
+    std::vector<BLOCK> region; // what some path brings it to
 };
 
 // Those of one block. Writes are in the order of blocks and statements.
@@ -175,55 +152,57 @@ int EXPRESSION::last_change(int block) {
 
 void EXPRESSION::reach(int block, int change) {
     --function.blocks_left;
-    uint16_t f = REACHED;
+    uint8_t f = REACHED;
     if (change) f |= ALTERED;
     if (t.may_trap) {
         const auto [begin, end] = in_block(statements_that_may_stay(), block);
-        if (begin != end || function.is_endless[static_cast<size_t>(block)]) f |= STAYS;
+        if (begin != end || function.is_dead_end[static_cast<size_t>(block)]) f |= STAYS;
     }
-    facts[static_cast<size_t>(block)] = f;
+    function.facts[static_cast<size_t>(block)] = f;
     touched.push_back(block);
 }
 
-void EXPRESSION::forget() {
-    for (int b : touched) facts[static_cast<size_t>(b)] = 0;
-    touched.clear();
-    region.clear();
-    changes.clear();
+// What is computed between two changes matters to its block alone.
+void EXPRESSION::enter_sites(size_t begin, size_t end, CHANGES c) {
+    const auto block = static_cast<size_t>(t.sites[begin].block);
+    auto enter = [&](const TRIPLE_SITE& s) {
+        events.push_back({{MOTION_EVENT::USE, block, s.position, !s.is_certain}, &s});
+    };
+    size_t i = begin;
+    for (; i < end && (!c.first || t.sites[i].position <= c.first); ++i) enter(t.sites[i]);
+    if (!c.first) return;
+    events.push_back({{MOTION_EVENT::KILL, block, c.first}, nullptr});
+    if (c.last != c.first) events.push_back({{MOTION_EVENT::KILL, block, c.last}, nullptr});
+    for (; i < end; ++i)
+        if (t.sites[i].position > c.last) enter(t.sites[i]);
 }
 
 void EXPRESSION::find_local_facts() {
-    forget();
-    for (size_t i = 0; i < t.sites.size();) {
+    events.clear();
+    for (size_t i = 0, end; i < t.sites.size(); i = end) {
         const int block = t.sites[i].block;
+        for (end = i + 1; end < t.sites.size() && t.sites[end].block == block;) ++end;
         CHANGES c;
         c.first = first_change(block);
         if (c.first) c.last = std::max(c.first, last_change(block));
-        if (c.first) changes[block] = c;
         reach(block, c.first);
-        int first_stay = 0;
-        if (at(block) & STAYS) {
-            const auto [begin, end] = in_block(statements_that_may_stay(), block);
-            if (begin != end) first_stay = begin->position;
-        }
-        for (; i < t.sites.size() && t.sites[i].block == block; ++i) {
-            const TRIPLE_SITE& site = t.sites[i];
-            const bool is_ahead_of_stay = !first_stay || site.position <= first_stay;
-            if (!c.first || site.position <= c.first)
-                at(block) |= site.is_certain && is_ahead_of_stay ? ANTLOC | EXPOSED : EXPOSED;
-            if (site.is_certain && site.position > c.last) at(block) |= AVLOC;
-        }
+        enter_sites(i, end, c);
+        for (size_t k = i; k < end; ++k)
+            if (t.sites[k].is_certain && t.sites[k].position > c.last) at(block) |= AVLOC;
     }
 }
 
-void EXPRESSION::compute_PAVIN() {
+// Whether it comes to where it is computed ahead of any change.
+bool EXPRESSION::compute_PAVIN() {
+    if (print_debug >= 2) debug_printf("\n\tNext iteration of global PAVIN/PAVOUT loop\n");
     std::vector<const BBLK*> waiting;
+    region.clear();
     auto enter_successors = [&](const BBLK* b) {
         for (const EDGE* s = b->successors; s; s = s->rest) {
-            uint16_t& f = at(s->first->dfn);
+            uint8_t& f = at(s->first->dfn);
             if (f & PAVIN) continue;
-            f |= PAVIN | AVIN;
-            region.push_back(s->first->dfn);
+            f |= PAVIN;
+            region.push_back({s->first->dfn, f});
             if (!(f & ALTERED) && !(f & AVLOC)) waiting.push_back(s->first);
         }
     };
@@ -234,176 +213,153 @@ void EXPRESSION::compute_PAVIN() {
         waiting.pop_back();
         enter_successors(b);
     }
-}
-
-void EXPRESSION::compute_AVOUT() {
-    std::vector<int> waiting = region;
-    while (!waiting.empty()) {
-        const int b = waiting.back();
-        waiting.pop_back();
-        if (!(at(b) & AVIN)) continue;
-        bool all = bb(b) != currfuninfo->bb_list;
-        for (const EDGE* p = bb(b)->predecessors; p && all; p = p->rest) all = is_available_at_exit(p->first);
-        if (all) continue;
-        at(b) &= static_cast<uint16_t>(~AVIN);
-        if (!(at(b) & (AVLOC | ALTERED)))
-            for (const EDGE* s = bb(b)->successors; s; s = s->rest) waiting.push_back(s->first->dfn);
-    }
-}
-
-bool EXPRESSION::is_placed_at_exit(const BBLK* b) {
-    if (!b->successors) return false;
-    for (const EDGE* s = b->successors; s; s = s->rest)
-        if (!(at(s->first) & PPIN)) return false;
-    return true;
-}
-
-// Not one back to the head of a loop: the loop would no longer end in its test.
-bool EXPRESSION::edge_takes_computation(const BBLK* from, const BBLK* to) {
-    return from->successors->rest && to->predecessors->rest && !tree_is_EH_SWITCH(from->branch()) &&
-           !currfuninfo->loops->dominates(to, from);
-}
-
-// Ahead of the control statement, which must not act then.
-bool EXPRESSION::end_takes_computation(const BBLK* b) {
-    return !tree_is_EH_SWITCH(b->branch()) && !tree_has_side_effects(b->branch()->left);
-}
-
-bool EXPRESSION::may_be_placed(const BBLK* b) {
-    const uint16_t f = at(b);
-    if (b == currfuninfo->bb_list) return false;
-    if (!(f & ANTLOC) && ((f & (ALTERED | STAYS)) || !is_placed_at_exit(b))) return false;
-    for (const EDGE* p = b->predecessors; p; p = p->rest) {
-        if (is_available_at_exit(p->first) || edge_takes_computation(p->first, b)) continue;
-        if (!is_placed_at_exit(p->first) || !end_takes_computation(p->first)) return false;
-    }
-    return true;
-}
-
-void EXPRESSION::compute_PPIN() {
-    for (int b : region)
-        if ((at(b) & ANTLOC) || !(at(b) & (ALTERED | STAYS))) at(b) |= PPIN;
-    std::vector<int> waiting = region;
-    while (!waiting.empty()) {
-        const int b = waiting.back();
-        waiting.pop_back();
-        if (!(at(b) & PPIN) || may_be_placed(bb(b))) continue;
-        at(b) &= static_cast<uint16_t>(~PPIN);
-        for (const EDGE* p = bb(b)->predecessors; p; p = p->rest) {
-            waiting.push_back(p->first->dfn);
-            for (const EDGE* s = p->first->successors; s; s = s->rest) waiting.push_back(s->first->dfn);
-        }
-        for (const EDGE* s = bb(b)->successors; s; s = s->rest) waiting.push_back(s->first->dfn);
-    }
-}
-
-void EXPRESSION::compute_INSERT() {
-    std::vector<int> ends;
-    for (int b : region) {
-        if (!(at(b) & PPIN)) continue;
-        for (const EDGE* e = bb(b)->predecessors; e; e = e->rest) {
-            BBLK* p = e->first;
-            if (is_available_at_exit(p)) continue;
-            if (!is_placed_at_exit(p) || !end_takes_computation(p))
-                insert_on_edge.push_back({p, bb(b)});
-            else if (!is_placed_through(p) && !(at(p) & SEEN)) {
-                at(p->dfn) |= SEEN;
-                insert_at_end.push_back(p);
-            }
-        }
-    }
-    std::sort(insert_at_end.begin(), insert_at_end.end(), [](const BBLK* x, const BBLK* y) { return x->dfn < y->dfn; });
-    std::sort(insert_on_edge.begin(), insert_on_edge.end(), [](const EDGE_PLACE& x, const EDGE_PLACE& y) {
-        return x.from->dfn != y.from->dfn ? x.from->dfn < y.from->dfn : x.to->dfn < y.to->dfn;
+    size_t last = 0; // block
+    return function.blocks_left >= 0 && std::any_of(events.begin(), events.end(), [&](const EVENT& e) {
+        const bool is_first = e.block != last;
+        last = e.block;
+        return is_first && e.site && (at(static_cast<int>(e.block)) & PAVIN);
     });
 }
 
-// From the computations that go back to those that give the temporary its value.
-void EXPRESSION::find_saves() {
-    std::vector<const BBLK*> waiting;
-    auto need_at_entry = [&](const BBLK* b) {
-        for (const EDGE* e = b->predecessors; e; e = e->rest) {
-            uint16_t& f = at(e->first->dfn);
-            if ((f & NEEDED) || !(is_available_at_exit(e->first) || is_placed_through(e->first))) continue;
-            f |= NEEDED;
-            waiting.push_back(e->first);
-        }
-    };
-    for (const TRIPLE_SITE& site : t.sites)
-        if (is_redundant_in(site.block)) need_at_entry(site.bb);
-    while (!waiting.empty()) {
-        const BBLK* b = waiting.back();
-        waiting.pop_back();
-        if (!(at(b) & AVLOC)) need_at_entry(b);
+bool EXPRESSION::is_partially_available() {
+    find_local_facts();
+    const bool is_available = compute_PAVIN();
+    for (int b : touched) function.facts[static_cast<size_t>(b)] = 0;
+    touched.clear();
+    return is_available;
+}
+
+bool EXPRESSION::may_be_redundant() {
+    if (!is_partially_available()) return false;
+    if (!t.reads_memory) return true;
+    with_memory = true;
+    return is_partially_available();
+}
+
+void EXPRESSION::enter(MOTION& motion, CANDIDATES bit) const {
+    for (const BLOCK& b : region) {
+        MOTION_SETS& s = motion.sets[static_cast<size_t>(b.block)];
+        if (!(b.facts & ALTERED)) s.passes |= bit;
+        if (!(b.facts & (ALTERED | STAYS))) s.demands |= bit;
     }
-    for (size_t i = 0; i < t.sites.size();) {
-        const int block = t.sites[i].block;
-        const uint16_t f = at(block);
-        auto c = changes.find(block);
-        const int first_change = c == changes.end() || !c->second.first ? 1 << 30 : c->second.first;
-        const int last_change = c == changes.end() ? 0 : c->second.last;
-        const bool is_deleted = is_redundant_in(block);
-        int saved_at = 0;
-        for (; i < t.sites.size() && t.sites[i].block == block; ++i) {
-            const TRIPLE_SITE& site = t.sites[i];
-            if (is_deleted && site.position <= first_change)
-                replace.push_back(&site);
-            else if ((f & NEEDED) && site.position > last_change && (saved_at || site.is_certain)) {
-                (saved_at ? replace : save).push_back(&site);
-                saved_at = site.position;
-            }
+    for_each_block(events, [&](size_t b, size_t begin, size_t end) {
+        int first_stay = INT32_MAX;
+        if (t.may_trap) {
+            const auto [stays, stays_end] = in_block(statements_that_may_stay(), static_cast<int>(b));
+            if (stays != stays_end) first_stay = stays->position;
         }
+        motion.enter_block(bit, events, begin, end, first_stay);
+    });
+}
+
+// ---- Placing
+
+// Expressions that are placed together.
+class BATCH {
+public:
+    BATCH(const FUNCTION& function, std::vector<std::unique_ptr<EXPRESSION>>& expressions);
+    // Whether the temporary of an expression pays; what is to be done is marked at its events then.
+    bool decide(size_t k);
+    // The blocks of edges on which it is computed.
+    struct EDGE_PLACE {
+        BBLK *from, *to;
+    };
+    const std::vector<EDGE_PLACE>& insertions() const { return inserted_on; }
+
+private:
+    void compute_PPIN();
+    void find_insertions(CANDIDATES bit);
+    bool is_given(size_t k) const;
+    bool is_given_where_deleted(size_t k) const;
+    bool pays(const EXPRESSION& e) const;
+    void dump_annotations(size_t k) const;
+    CANDIDATES needed_at_entry(size_t b) const { return life.reads[b] | (live[b] & ~life.sets[b]); }
+    CANDIDATES available_at_exit(size_t b) const { return motion.sets[b].last | (known[b] & motion.sets[b].passes); }
+
+    const FUNCTION& function;
+    const MOTION_GRAPH& graph;
+    std::vector<std::unique_ptr<EXPRESSION>>& expressions;
+    MOTION motion;
+    VALUE_LIFE life;
+    INSERTIONS inserted;
+    std::vector<CANDIDATES> known, live; // at entry, and needed at exit, by block
+    CANDIDATES redundant = 0;
+    std::vector<EDGE_PLACE> inserted_on;
+};
+
+BATCH::BATCH(const FUNCTION& function, std::vector<std::unique_ptr<EXPRESSION>>& expressions)
+    : function(function), graph(function.graph), expressions(expressions), motion(graph), life(motion) {
+    for (size_t k = 0; k < expressions.size(); ++k) expressions[k]->enter(motion, CANDIDATES(1) << k);
+    compute_PPIN();
+}
+
+void BATCH::compute_PPIN() {
+    inserted = motion.latest_insertions_off_back_edges(*currfuninfo->loops);
+    known = motion.available(inserted);
+    for (size_t k = 0; k < expressions.size(); ++k)
+        if (decide_reads(expressions[k]->events, CANDIDATES(1) << k, known, life)) redundant |= CANDIDATES(1) << k;
+    life.edge_sets = inserted;
+    live = life.live_at_end(graph);
+    for (size_t k = 0; k < expressions.size(); ++k) decide_saves(expressions[k]->events, CANDIDATES(1) << k, live);
+}
+
+void BATCH::find_insertions(CANDIDATES bit) {
+    inserted_on.clear();
+    for (size_t b : graph.order) {
+        if (!(needed_at_entry(b) & bit)) continue;
+        for (size_t i = 0; i < inserted[b].size(); ++i)
+            if (inserted[b][i] & bit) inserted_on.push_back({graph.blocks[graph.before[b][i]], graph.blocks[b]});
     }
 }
 
 // A load counts for more than the operation that it is, a computation that may be left out for half.
-bool EXPRESSION::pays() const {
-    const double cost = t.cost;
+bool BATCH::pays(const EXPRESSION& e) const {
+    const double cost = e.t.cost;
     double gain = 0;
-    for (const TRIPLE_SITE* site : replace) gain += (site->is_certain ? cost : cost / 2) * function.runs.of(site->bb);
-    for (const TRIPLE_SITE* site : save) gain -= function.runs.of(site->bb);
-    for (const BBLK* b : insert_at_end) gain -= (cost + 1) * function.runs.of(b);
-    for (const EDGE_PLACE& e : insert_on_edge) gain -= (cost + 1) * function.runs.of_edge(e.from, e.to);
-    if (size_speed_goal() < 2 && insert_at_end.size() + insert_on_edge.size() >= replace.size()) return false;
+    size_t deleted = 0;
+    for (const EVENT& at : e.events) {
+        if (!at.site) continue;
+        const double runs = function.runs.of(at.site->bb);
+        deleted += at.is_deleted;
+        if (at.is_deleted)
+            gain += (at.is_conditional ? cost / 2 : cost) * runs;
+        else if (at.is_saved)
+            gain -= runs;
+    }
+    for (const EDGE_PLACE& place : inserted_on) gain -= (cost + 1) * function.runs.of_edge(place.from, place.to);
+    if (size_speed_goal() < 2 && inserted_on.size() >= deleted) return false;
     return gain > 1e-6;
 }
 
-bool EXPRESSION::may_be_redundant() {
-    find_local_facts();
-    compute_PAVIN();
-    return function.blocks_left >= 0 && std::any_of(t.sites.begin(), t.sites.end(), [this](const TRIPLE_SITE& site) {
-        return (at(site.block) & (EXPOSED | PAVIN)) == (EXPOSED | PAVIN);
-    });
-}
-
-bool EXPRESSION::decide() {
-    if (!may_be_redundant()) return false;
-    if (t.reads_memory) {
-        with_memory = true;
-        if (!may_be_redundant()) return false;
-    }
-    compute_AVOUT();
-    compute_PPIN();
-    compute_INSERT();
-    find_saves();
-    return !replace.empty() && pays();
+bool BATCH::decide(size_t k) {
+    if (!(redundant >> k & 1)) return false;
+    find_insertions(CANDIDATES(1) << k);
+    if (!pays(*expressions[k]) || !is_given(k) || !is_given_where_deleted(k)) return false;
+    if (print_debug >= 2) dump_annotations(k);
+    return true;
 }
 
 // ---- Checks and dumps
 
-bool EXPRESSION::is_given_where_deleted(int number) {
+// The temporary is set on each path to where it is read: nothing waits for it at the entry of the function.
+bool BATCH::is_given(size_t k) const {
+    const EXPRESSION& e = *expressions[k];
+    const size_t entry = graph.order.front();
+    if (!(needed_at_entry(entry) >> k & 1)) return true;
+    debug_printf("\n\n!!! GCSE(): <%d> is not AVOUT||INSERT in BB %d %s\n", e.number, graph.blocks[entry]->dfn,
+                 tree_to_infix(e.t.tree).c_str());
+    return false;
+}
+
+bool BATCH::is_given_where_deleted(size_t k) const {
+    const EXPRESSION& e = *expressions[k];
     bool is_given = true;
-    int last = 0;
-    for (const TRIPLE_SITE* site : replace) {
-        if (site->block == last || !is_redundant_in(site->block)) continue;
-        last = site->block;
-        for (const EDGE* p = site->bb->predecessors; p; p = p->rest) {
-            auto is_edge = [&](const EDGE_PLACE& e) { return e.from == p->first && e.to == site->bb; };
-            if (is_available_at_exit(p->first) || is_placed_through(p->first)) continue;
-            if (std::find(insert_at_end.begin(), insert_at_end.end(), p->first) != insert_at_end.end()) continue;
-            if (std::any_of(insert_on_edge.begin(), insert_on_edge.end(), is_edge)) continue;
-            debug_printf("\n\n!!! GCSE(): <%d> is DELETE-AVOUT||INSERT in BB %d %s\n", number, site->block,
-                         tree_to_infix(t.tree).c_str());
+    for (const EVENT& at : e.events) {
+        if (!at.is_deleted || at.is_local) continue;
+        for (size_t i = 0; i < graph.before[at.block].size(); ++i) {
+            if ((available_at_exit(graph.before[at.block][i]) | inserted[at.block][i]) >> k & 1) continue;
+            debug_printf("\n\n!!! GCSE(): <%d> is DELETE-AVOUT||INSERT in BB %d %s\n", e.number, at.site->block,
+                         tree_to_infix(e.t.tree).c_str());
             is_given = false;
         }
     }
@@ -411,17 +367,25 @@ bool EXPRESSION::is_given_where_deleted(int number) {
 }
 
 // By block, what holds of the expression: its number, or nothing.
-void EXPRESSION::dump_annotations(int number) {
-    auto line = [number](const char* format, bool holds) {
-        debug_printf(format, holds ? ("{" + std::to_string(number) + "}").c_str() : "{}");
+void BATCH::dump_annotations(size_t k) const {
+    const std::string number = "{" + std::to_string(expressions[k]->number) + "}";
+    auto line = [&](const char* format, CANDIDATES set) {
+        debug_printf(format, set >> k & 1 ? number.c_str() : "{}"); // NOLINT: the formats below
     };
-    for (int b : region) {
-        debug_printf("\n\nMore global dataflow data for BB->DFN %d\n", b);
-        line("   ALTERED:\t%s\n", at(b) & ALTERED);
-        line("   PPIN:\t%s\n", at(b) & PPIN);
-        line("   PPOUT:\t%s\n", is_placed_at_exit(bb(b)));
-        line("   INSERT:\t%s\n", std::find(insert_at_end.begin(), insert_at_end.end(), bb(b)) != insert_at_end.end());
-        line("   DELETE:\t%s\n", is_redundant_in(b));
+    for (size_t b : graph.order) {
+        const MOTION_SETS& s = motion.sets[b];
+        CANDIDATES inserted_behind = 0;
+        for (size_t next : graph.after[b])
+            for (size_t i = 0; i < inserted[next].size(); ++i)
+                if (graph.before[next][i] == b) inserted_behind |= inserted[next][i];
+        const CANDIDATES all = s.first | s.last | s.passes | known[b] | live[b] | inserted_behind;
+        if (!(all >> k & 1)) continue;
+        debug_printf("\n\nMore global dataflow data for BB->DFN %d\n", graph.blocks[b]->dfn);
+        line("   ALTERED:\t%s\n", ~s.passes);
+        line("   PPIN:\t%s\n", known[b] & needed_at_entry(b));
+        line("   PPOUT:\t%s\n", live[b]);
+        line("   INSERT:\t%s\n", inserted_behind);
+        line("   DELETE:\t%s\n", known[b] & s.first);
     }
 }
 
@@ -432,49 +396,27 @@ public:
     void run();
 
 private:
-    void find_blocks();
     void find_steps();
+    void order_triples();
+    std::vector<std::unique_ptr<EXPRESSION>> next_batch();
+    void place(std::vector<std::unique_ptr<EXPRESSION>>& expressions);
     void keep_what_stands(TRIPLE& t);
+    bool must_wait(const EXPRESSION& e, const std::unordered_set<const NODE*>& held_back) const;
     bool is_worth_a_look(const TRIPLE& t) const;
     bool is_induction(const TRIPLE& t) const;
-    void apply(const EXPRESSION& e, const TRIPLE& t);
-    void insert_useful_blocks();
+    void apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>& insertions);
     void finish();
 
-    EXPRESSION::FUNCTION function;
+    FUNCTION function;
+    std::deque<size_t> waiting;           // the triples still to be looked at, a tree ahead of what it consists of
     std::unordered_set<const NODE*> gone; // nodes of trees that were taken away; membership only
     std::vector<NODE*> taken_away;        // erased at the end: they hold slots of other expressions
     STATEMENTS_AHEAD ahead;
-    std::map<std::pair<int, int>, std::vector<NODE*>> on_edges; // by the numbers of the blocks
+    EDGE_STATEMENTS on_edges;
     // Outermost loops that step a variable; membership only.
     std::unordered_map<const SYMTAB*, std::unordered_set<const NATURAL_LOOP*>> stepped_in;
     int applied = 0;
 };
-
-void GLOBAL_CSE::find_blocks() {
-    const size_t count = static_cast<size_t>(currfuninfo->bb_count) + 1;
-    function.blocks.assign(count, nullptr);
-    function.facts.assign(count, 0);
-    std::vector<bool> ends(count, false);
-    std::vector<BBLK*> waiting;
-    for (BBLK* b = currfuninfo->bb_list; b; b = b->dflink) {
-        function.blocks[static_cast<size_t>(b->dfn)] = b;
-        if (b->successors) continue;
-        ends[static_cast<size_t>(b->dfn)] = true;
-        waiting.push_back(b);
-    }
-    while (!waiting.empty()) {
-        const BBLK* b = waiting.back();
-        waiting.pop_back();
-        for (const EDGE* p = b->predecessors; p; p = p->rest) {
-            if (ends[static_cast<size_t>(p->first->dfn)]) continue;
-            ends[static_cast<size_t>(p->first->dfn)] = true;
-            waiting.push_back(p->first);
-        }
-    }
-    function.is_endless = std::move(ends);
-    function.is_endless.flip();
-}
 
 // Sites within what another expression took away are none any more.
 void GLOBAL_CSE::keep_what_stands(TRIPLE& t) {
@@ -527,7 +469,7 @@ void GLOBAL_CSE::find_steps() {
             auto [at, is_new] = stepped_in.try_emplace(x);
             if (!is_new) continue;
             for (const TRIPLE_WRITE& w : writes_of_variable(x)) {
-                const NATURAL_LOOP* loop = outermost_loop_around(function.blocks[static_cast<size_t>(w.block)]);
+                const NATURAL_LOOP* loop = outermost_loop_around(function.graph.blocks[static_cast<size_t>(w.block)]);
                 if (loop && is_step(w.statement, x)) at->second.insert(loop);
             }
         }
@@ -544,73 +486,93 @@ bool GLOBAL_CSE::is_induction(const TRIPLE& t) const {
     });
 }
 
-void GLOBAL_CSE::apply(const EXPRESSION& e, const TRIPLE& t) {
+void GLOBAL_CSE::apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>& insertions) {
+    const TRIPLE& t = e.t;
     SYMTAB* temp = sym_temp('U', -1, t.tree->type->stqs(), t.tree->ls);
     const std::string text = print_debug ? tree_to_infix(t.tree) : std::string();
     auto name = [temp](const NODE* like) { return coerce_to_type(like->type->stqs(), mk_NAME(temp, like->ls)); };
-    auto insertion = [&](const BBLK* in) {
-        if (print_debug) debug_printf("\tInsertion in block %d:\t %s\n", in->dfn, text.c_str());
-        return mk_ASG(mk_NAME(temp, nullptr), copy_tree(t.tree));
-    };
-    for (BBLK* b : e.insert_at_end) insert_at_end_of_body(b, insertion(b));
-    for (const EXPRESSION::EDGE_PLACE& p : e.insert_on_edge)
-        on_edges[{p.from->dfn, p.to->dfn}].push_back(insertion(p.from));
-    for (const TRIPLE_SITE* s : e.save) {
-        NODE* value = *s->slot;
-        *s->slot = name(value);
+    for (const BATCH::EDGE_PLACE& p : insertions) {
+        if (print_debug) debug_printf("\tInsertion in block %d:\t %s\n", p.from->dfn, text.c_str());
+        on_edges.add(p.from, p.to, mk_ASG(mk_NAME(temp, nullptr), copy_tree(t.tree)));
+    }
+    for (const EVENT& at : e.events) {
+        if (!at.site || !(at.is_deleted || at.is_saved)) continue;
+        const TRIPLE_SITE& s = *at.site;
+        NODE* value = *s.slot;
+        *s.slot = name(value);
+        if (at.is_deleted) {
+            if (print_debug) debug_printf("\tDeletion in block %d:\t%s\t<==  %s\n", s.block, text.c_str(), temp->name);
+            for_each_subtree(static_cast<const NODE*>(value), [this](const NODE* n) { gone.insert(n); });
+            taken_away.push_back(value);
+            continue;
+        }
         // What it consists of is looked at later, and stands ahead of it then.
-        ahead[s->cell].push_back({-++applied, mk_ASG(mk_NAME(temp, value->ls), value)});
-        if (print_debug) debug_printf("\tTemp added in block %d:\t %s\n", s->block, temp->name);
-    }
-    for (const TRIPLE_SITE* s : e.replace) {
-        NODE* value = *s->slot;
-        if (print_debug) debug_printf("\tDeletion in block %d:\t%s\t<==  %s\n", s->block, text.c_str(), temp->name);
-        for_each_subtree(static_cast<const NODE*>(value), [this](const NODE* n) { gone.insert(n); });
-        taken_away.push_back(value);
-        *s->slot = name(value);
-    }
-}
-
-// Only the edges that a computation is put on are split: a block of its own on any other would hinder what
-// follows.
-void GLOBAL_CSE::insert_useful_blocks() {
-    for (auto& [edge, assignments] : on_edges) {
-        BBLK* between = split_cfg_edge(function.blocks[static_cast<size_t>(edge.first)],
-                                       function.blocks[static_cast<size_t>(edge.second)], false);
-        for (NODE* t : assignments) insert_at_end_of_body(between, t);
+        ahead[s.cell].push_back({-++applied, mk_ASG(mk_NAME(temp, value->ls), value)});
+        if (print_debug) debug_printf("\tTemp added in block %d:\t %s\n", s.block, temp->name);
     }
 }
 
 void GLOBAL_CSE::finish() {
     for (BBLK* b = currfuninfo->bb_list; b; b = b->dflink) insert_statements_ahead(b, ahead);
-    insert_useful_blocks();
+    const bool has_split = on_edges.insert_useful_blocks();
     for (NODE* t : taken_away) erase_tree(t);
-    if (!on_edges.empty()) renumber_bblocks();
     if (!taken_away.empty()) sym_split(currfuninfo);
-    changed(on_edges.empty() ? fact::graph : fact::none);
+    changed(has_split ? fact::none : fact::graph);
 }
 
-void GLOBAL_CSE::run() {
-    find_blocks();
+void GLOBAL_CSE::order_triples() {
     std::vector<size_t> order(unique_triples.size());
     std::iota(order.begin(), order.end(), size_t(0));
-    // A tree ahead of what it consists of.
     std::stable_sort(order.begin(), order.end(),
                      [](size_t a, size_t b) { return unique_triples[a].cost > unique_triples[b].cost; });
+    waiting.assign(order.begin(), order.end());
     for (const TRIPLE& t : unique_triples) {
         function.questions_left += 64 * static_cast<int64_t>(t.sites.size());
         function.blocks_left += 256 * static_cast<int64_t>(t.sites.size());
     }
-    find_steps();
-    for (size_t i : order) {
-        TRIPLE& t = unique_triples[i];
+}
+
+std::vector<std::unique_ptr<EXPRESSION>> GLOBAL_CSE::next_batch() {
+    std::vector<std::unique_ptr<EXPRESSION>> batch;
+    for (; !waiting.empty() && batch.size() < MOST_CANDIDATES; waiting.pop_front()) {
+        TRIPLE& t = unique_triples[waiting.front()];
         keep_what_stands(t);
         if (!is_worth_a_look(t) || is_induction(t)) continue;
-        EXPRESSION e(t, function);
-        if (!e.decide() || !e.is_given_where_deleted(static_cast<int>(i))) continue;
-        if (print_debug >= 2) e.dump_annotations(static_cast<int>(i));
-        apply(e, t);
+        auto e = std::make_unique<EXPRESSION>(t, static_cast<int>(waiting.front()), function);
+        if (e->may_be_redundant()) batch.push_back(std::move(e));
     }
+    return batch;
+}
+
+// What was decided rests on sites that are none any more, or a tree that it is part of has to wait.
+bool GLOBAL_CSE::must_wait(const EXPRESSION& e, const std::unordered_set<const NODE*>& held_back) const {
+    return std::any_of(e.t.sites.begin(), e.t.sites.end(), [&](const TRIPLE_SITE& s) {
+        return gone.count(*s.slot) != 0 || held_back.count(*s.slot) != 0;
+    });
+}
+
+void GLOBAL_CSE::place(std::vector<std::unique_ptr<EXPRESSION>>& expressions) {
+    BATCH batch(function, expressions);
+    function.blocks_left -= static_cast<int64_t>(function.graph.blocks.size());
+    std::unordered_set<const NODE*> held_back; // membership only
+    std::vector<size_t> again;
+    for (size_t k = 0; k < expressions.size(); ++k) {
+        const EXPRESSION& e = *expressions[k];
+        if (must_wait(e, held_back)) {
+            again.push_back(static_cast<size_t>(e.number));
+            for (const TRIPLE_SITE& s : e.t.sites)
+                for_each_subtree(static_cast<const NODE*>(*s.slot), [&](const NODE* n) { held_back.insert(n); });
+        } else if (batch.decide(k)) {
+            apply(e, batch.insertions());
+        }
+    }
+    waiting.insert(waiting.begin(), again.begin(), again.end());
+}
+
+void GLOBAL_CSE::run() {
+    order_triples();
+    find_steps();
+    for (auto batch = next_batch(); !batch.empty(); batch = next_batch()) place(batch);
     finish();
 }
 

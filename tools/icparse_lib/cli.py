@@ -1,13 +1,20 @@
 """The command line."""
 import argparse
+import gc
 import os
+import platform
+import shutil
 import sys
+
+import pycparser
 
 from . import preprocess, types as T
 from .errors import CompileError, all_errors
 from .model import Unit
 from .translator import Translator, finish
 from .writer import Writer
+
+LARGE_INPUT = 100_000  # bytes of source
 
 
 def parse_arguments(arguments):
@@ -53,8 +60,8 @@ def translate(options, rewrite=None):
         unit.name_prefix = ""
         unit.option_sets.setdefault(0, []).insert(0, "--abi=eabi")
     for path in options.files:
-        tree = preprocess.parse(path, options.include, options.define, options.abi == "eabi")
-        Translator(unit, linked, None if options.quiet else sys.stderr).file(tree)
+        translator = Translator(unit, linked, None if options.quiet else sys.stderr)
+        translator.file(preprocess.parse(path, options.include, options.define, options.abi == "eabi", translator.warn))
     finish(unit)
     if rewrite:
         rewrite(unit)
@@ -73,9 +80,19 @@ def show_source(where):
         print(f"    {line}\n    {indent}^", file=sys.stderr)
 
 
+def take_compiling_python(arguments):
+    """Continues in a Python that compiles itself, where one is installed and the input is worth its slower start."""
+    sizes = sum(os.path.getsize(word) for word in arguments if word.endswith(".c") and os.path.isfile(word))
+    faster = shutil.which("pypy3")
+    if sizes > LARGE_INPUT and faster and platform.python_implementation() == "CPython":
+        library = os.path.dirname(os.path.dirname(pycparser.__file__))
+        os.execve(faster, [faster, *sys.argv], dict(os.environ, PYTHONPATH=library))
+
+
 def main(arguments, rewrite=None):
     options = parse_arguments(arguments)
     sys.setrecursionlimit(20000)
+    gc.disable()  # a run allocates what it needs until its end; collections would look at all of it again and again
     try:
         data = translate(options, rewrite)
     except CompileError as error:

@@ -191,8 +191,13 @@ class TypeBuilder:
         if not T.is_integer(type_):
             raise CompileError(where, f"a bit-field cannot have type '{type_}'")
         limit = 1 if T.as_integer(type_).kind == 0 else type_.size
-        if not (0 if decl.name is None else 1) <= width <= limit:
-            raise CompileError(where, f"bad bit-field width {width}")
+        if width == 0 and decl.name is not None:
+            raise CompileError(where, f"the bit-field '{decl.name}' has width 0, which only one without a name may have")
+        if not 0 <= width <= limit:
+            wider = next((t for t in (T.LONG, T.LLONG) if limit > 1 and t.size >= width > 0), None)
+            hint = f"; '{wider}' has {wider.size}" if wider else ""
+            raise CompileError(where, f"bad bit-field width {width}: a bit-field has at most the bits of its type, and "
+                               f"'{type_}' has {limit}{hint}")
         return width
 
     def _enum(self, node, where):

@@ -5,14 +5,15 @@ import subprocess
 
 from pycparser import c_parser
 
+from . import pragma_places
 from .errors import CompileError, Position
+from .pragma_places import LINE_MARKER
 
 HEADERS = os.path.join(os.path.dirname(os.path.abspath(__file__)), "..", "include")
 
 ASM = re.compile(r"\b(?:asm|__asm__|__asm)(?:\s+(?:volatile|__volatile__))?\s*(?=\()")
 TOKEN = re.compile(r'"(?:\\.|[^"\\\n])*"|\'(?:\\.|[^\'\\\n])*\'|^\#[^\n]*|[{}\n]|\b(?:__asm__|__asm|asm)\b', re.M)
 FILE_SCOPE_ASM = re.compile(r'\w+\s*(?:volatile\s*)?\(((?:\s*"(?:\\.|[^"\\])*")+)\s*\)\s*;')
-LINE_MARKER = re.compile(r'#\s*(?:line\s+)?(\d+)\s+"((?:\\.|[^"\\])*)"')
 PARSE_ERROR = re.compile(r"(.*?):(\d+):(?:(\d+):)?\s*(.*)", re.S)
 CPP_ERROR = re.compile(r"^(.*?):(\d+):(\d+): (?:fatal )?error: (.*)$", re.M)
 
@@ -68,14 +69,36 @@ def lift_file_scope_asm(text):
     return "".join(out) + text[last:]
 
 
-def parse(path, include_dirs, defines, eabi):
-    """The syntax tree of a source file."""
+class Parser(c_parser.CParser):
+    """The library's parser; its longest lists grow in place here, where it copies them for each element."""
+
+    def p_block_item_list(self, p):
+        """ block_item_list : block_item
+                            | block_item_list block_item
+        """
+        p[0] = p[1]
+        if len(p) > 2 and p[2] != [None]:
+            p[0] += p[2]
+
+    def p_struct_declaration_list(self, p):
+        """ struct_declaration_list     : struct_declaration
+                                        | struct_declaration_list struct_declaration
+        """
+        p[0] = p[1] or []
+        if len(p) > 2:
+            p[0] += p[2] or []
+
+
+def parse(path, include_dirs, defines, eabi, warn):
+    """The syntax tree of a source file; `warn` takes a position and a text."""
     if not os.path.isfile(path):
         raise CompileError(None, f"cannot read {path}")
     text = preprocess(path, include_dirs, defines, eabi)
     if "asm" in text:
         text = ASM.sub(lambda m: "asm" + " " * (len(m[0]) - 3), lift_file_scope_asm(text))
-    parser = c_parser.CParser()
+    if "#pragma" in text:
+        text = pragma_places.settle(text, warn)
+    parser = Parser()
     try:
         return parser.parse(BUILT_IN_TYPES + text, path)
     except AssertionError as error:  # some malformed declarations reach the parser library's own checks

@@ -27,6 +27,7 @@ class Statements:
         self.labels = {}        # name: [number, defined, position of first use]
         self.break_labels, self.continue_labels, self.switches = [], [], []
         self.loop_pragmas = []  # for the next loop
+        self.last_lines = {}  # of the syntax nodes of loops
         self.regions = []  # exception entries that calls are in, the innermost last
         self.reachable = True
         self.builders = {
@@ -263,7 +264,23 @@ class Statements:
         where = position_of(node)
         start = str(where.line) if where.file == self.body.position.file else f"{where.file}:{where.line}"
         variable = loop_variable(node.next) if isinstance(node, A.For) else ""
-        return Pragma(pragmas.SRC_LOOP, [start, variable, str(last_line(node)), keyword])
+        return Pragma(pragmas.SRC_LOOP, [start, variable, str(self._last_line(node)), keyword])
+
+    def _last_line(self, node):
+        """The greatest line number of a loop's syntax tree. The first call for an outer loop finds those of its inner ones."""
+        if node not in self.last_lines:
+            before, pending = [], [node]
+            while pending:
+                item = pending.pop()
+                below = [child for _, child in item.children()]
+                before.append((item, below))
+                pending += below
+            lines = {}
+            for item, below in reversed(before):
+                lines[item] = max([getattr(item.coord, "line", 0) or 0, *map(lines.get, below)])
+                if isinstance(item, (A.For, A.While, A.DoWhile)):
+                    self.last_lines[item] = lines[item]
+        return self.last_lines[node]
 
     def _end_loop(self, done):
         self.continue_labels.pop()
@@ -438,16 +455,6 @@ def loop_variable(step):
     """The name that a for loop's step changes, if it is a plain one."""
     target = getattr(step, "expr", None) or getattr(step, "lvalue", None)
     return target.name if isinstance(target, A.ID) else ""
-
-
-def last_line(node):
-    """The greatest line number in a syntax tree."""
-    last, pending = 0, [node]
-    while pending:
-        item = pending.pop()
-        last = max(last, getattr(item.coord, "line", 0) or 0)
-        pending += [child for _, child in item.children()]
-    return last
 
 
 def assembly_text(node, where):

@@ -19,7 +19,12 @@ LIST_HEADER, LIST_TRAILER = 254, 255
 PARAMETERS, ENUMERATORS, MEMBERS = 0, 1, 7
 
 
+BYTES = [bytes([value]) for value in range(256)]
+
+
 def uint(value):
+    if 0 <= value < 128:
+        return BYTES[value]
     value &= (1 << 64) - 1
     out = bytearray()
     while value > 127:
@@ -47,7 +52,7 @@ def flag(value):
 
 
 def record(kind, payload):
-    return bytes([kind]) + uint(len(payload)) + payload
+    return BYTES[kind] + uint(len(payload)) + payload
 
 
 def i32(value):
@@ -324,7 +329,7 @@ class Writer:
         pending = [tree]
         while pending:
             node = pending.pop()
-            self.out += record(NODE, bytes([node.op]) + self.types.number(node.type) + self._value(node))
+            self.out += record(NODE, BYTES[node.op] + self.types.number(node.type) + self._value(node))
             if node.right is not None:
                 pending.append(node.right)
             if node.left is not None:

@@ -27,6 +27,8 @@ class Warnings(list):
 def translate(source, abi="legacy", warnings=None):
     """The unit of a program text, whose file is called t.c."""
     T.set_abi(abi == "eabi")
+    unit = Unit("t.c")
+    translator = Translator(unit, {}, warnings)
     with tempfile.TemporaryDirectory() as folder:
         path = os.path.join(folder, "t.c")
         with open(path, "w") as out:
@@ -34,11 +36,10 @@ def translate(source, abi="legacy", warnings=None):
         here = os.getcwd()
         os.chdir(folder)
         try:
-            tree = preprocess.parse("t.c", [], [], abi == "eabi")
+            tree = preprocess.parse("t.c", [], [], abi == "eabi", translator.warn)
         finally:
             os.chdir(here)
-    unit = Unit("t.c")
-    Translator(unit, {}, warnings).file(tree)
+    translator.file(tree)
     finish(unit)
     return unit
 

@@ -98,6 +98,21 @@ class Symbols(unittest.TestCase):
         self.assertEqual(symbol_of(unit, "_d").pragmas, [(2, ["fast"]), (0, ["8"])])
         self.assertEqual(symbol_of(unit, "_d").align, 128)
 
+    def test_pragmas_within_declarations_and_statements(self):
+        tokens = """struct s { int a : 3 ; int b [ 2 ] ; } ; static const int t [ ] = { 1 , { 2 } , 3 } ; int f ( int n , int k ) {
+            int r = n ? k : t [ n ] ; if ( n ) for ( int i = 0 ; i < k ; i ++ ) { r += 2 ; } else do r -- ; while ( r ) ;
+            switch ( r ) { case 1 : r = 2 ; default : return r ; } }""".split()
+        wanted = body_of(translate(" ".join(tokens)))
+        for place in range(len(tokens) + 1):
+            unit = translate(" ".join(tokens[:place] + ['_Pragma("NOBODYS(1)")'] + tokens[place:]))
+            self.assertEqual(body_of(unit), wanted, " ".join(tokens[max(0, place - 3):place]))
+        warnings = Warnings()
+        translate('int x;\nint _Pragma("NOBODYS") y;', warnings=warnings)
+        self.assertEqual(warnings, ["t.c:2:9: warning: the pragma 'NOBODYS' is not known here and is ignored"])
+        for words in ("interrupt void f", "void interrupt f", "static void __interrupt f", 'void _Pragma("INTERRUPT(f)") f'):
+            unit = translate(f"int x; {words}(void); int y[] = {{ 1 }}; {words}(void) {{ x++; }} void (*p)(void) = f;")
+            self.assertEqual(symbol_of(unit, "_f").qualifier_bits, 0x20, words)
+
 
 class Headers(unittest.TestCase):
     FOLDER = os.path.join(ROOT, "tools", "include")

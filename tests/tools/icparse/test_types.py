@@ -119,7 +119,8 @@ class WrongTypes(unittest.TestCase):
     def test_positions(self):
         cases = [
             ("struct S { int a; int a; };", "t.c:1:23: error: duplicate member 'a'"),
-            ("struct S { int b : 17; };", "t.c:1:16: error: bad bit-field width 17"),
+            ("struct S { int b : 17; };", "t.c:1:16: error: bad bit-field width 17: a bit-field has at most the bits "
+             "of its type, and 'int' has 16; 'long' has 32"),
             ("int a[-1];", "t.c:1:5: error: negative array size"),
             ("struct S; struct S s;", "t.c:1:20: error: 's' has incomplete type 'struct S'"),
             ("int f(void)[3];", "t.c:1:5: error: a function cannot return 'int[3]'"),

@@ -69,11 +69,12 @@ class Tools:
     def of(cls, options):
         return cls(options.build, options.zopt, options.icrun, options.icdump, options.icparse)
 
-    def parse(self, source, unit, words=()):
-        """C source to I-file."""
-        done = run([self.icparse, "-I", INCLUDE, source, "-o", unit, *words])
+    def parse(self, sources, unit, words=()):
+        """One C source, or several that make a unit, to an I-file."""
+        sources = sources if isinstance(sources, list) else [sources]
+        done = run([self.icparse, "-I", INCLUDE, *sources, "-o", unit, *words])
         if done.status != 0:
-            raise Trouble(f"{source}: parser status {done.status}: {last_line(done)}")
+            raise Trouble(f"{sources[0]}: parser status {done.status}: {last_line(done)}")
 
     def optimize(self, unit, out, words=()):
         Path(out).unlink(missing_ok=True)

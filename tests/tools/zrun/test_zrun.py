@@ -50,7 +50,7 @@ void g(int *p, int *q, int n) { int i;
     for (i = 0; i < 31; i++)
         x[i + 1] = x[i] + i;  // note    dependence: .*'x\\[i \\+ 1\\]' .*'x\\[i\\]' .*1 apart
     for (i = 0; i < 32; i++) y[i] = 3; }  // done    dependence: no access
-int main(void) { x[0] = 1; x[5] = 7; g(x, y, 5);
+int main(void) { x[0] = 1; g(x, y, 5); x[5] = 7;
     put_i16(f(5)); put_i16(pair(x)); return 0; }  // done    inline: pair\\(\\) is expanded here; missed  inline: f\\(\\)
 """
 
@@ -76,6 +76,21 @@ class Zrun(unittest.TestCase):
         self.assertEqual(kept, ["p.if", "p.opt.if", "p.opt.out", "p.out"])
         again = subprocess.run([ZRUN, self.folder / "kept" / "p.opt.if", "-o1"], stdout=subprocess.PIPE)
         self.assertEqual(again.returncode, 0)
+
+    def test_several_files(self):
+        other = self.folder / "q.c"
+        other.write_text("int g(int x) { return x * 2; }")
+        done = self.zrun("-o2", other, "--opt_level=1", source="int g(int); int main(void) { return g(4); }")
+        self.assertIn("equal: 0 lines, status 8", done.stdout, done.stderr)
+        self.zrun("--keep", self.folder)
+        self.assertEqual(self.zrun(self.folder / "p.if").returncode, 2)
+
+    def test_a_stopped_program(self):
+        done = self.zrun("-o2", source="int absent(void);\nint main(void) {\n  return absent(); }")
+        self.assertEqual(done.returncode, 67, done.stderr)
+        self.assertIn("stopped, before and after: icrun: the function absent is nowhere defined (in main, line 3), status 67",
+                      done.stdout)
+        self.assertIn("equal: 0 lines, status 67", self.zrun(source="int main(void) { return 67; }").stdout)
 
     def test_loops(self):
         done = self.zrun("--opt_level=2", "--disable_inlining", "--float_support=fpu32", "--show", "--keep", self.folder, source=NEST)

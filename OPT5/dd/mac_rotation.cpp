@@ -16,6 +16,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/remark.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
@@ -284,7 +285,7 @@ void ROTATOR::rotate(ROTATION& r) {
     split_accumulations_in_bb(r.block);
     read_square_from_memory(r.block, mentions);
     for (LIST* s = r.block->statements; s->rest; s = s->rest)
-        if (is_mac(s->first) && may_be_late(r.block, s)) rotate(r, s);
+        if (is_mac(s->first) && may_be_late(r.block, s) && rewrite_is_allowed(s->first)) rotate(r, s);
 }
 
 void ROTATOR::run() {

@@ -22,6 +22,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
 #include "OPT5/ir/remark.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -596,7 +597,7 @@ bool promote_loads(const std::vector<std::unique_ptr<CANDIDATE>>& all, PROMOTION
         if (print_debug) debug_printf("\t%s\n", tree_to_infix(c->reference).c_str());
         for (const EVENT& e : c->events)
             if (e.kind != EVENT::KILL) c->weight += frequencies.of(graph.blocks[e.block]);
-        if (is_worth_it(*c, graph)) candidates.push_back(c.get());
+        if (is_worth_it(*c, graph) && rewrite_is_allowed(c->reference)) candidates.push_back(c.get());
     }
     std::stable_sort(candidates.begin(), candidates.end(),
                      [](const CANDIDATE* a, const CANDIDATE* b) { return a->weight > b->weight; });

@@ -20,6 +20,7 @@
 #include "OPT5/ir/frontiers.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -378,7 +379,7 @@ private:
     NODE* replace(NODE* t, bool is_place) {
         if (!t) return t;
         if (t->op == SSA_USE && !is_place)
-            if (NODE* value = value_for(t)) {
+            if (NODE* value = rewrite_is_allowed(t) ? value_for(t) : nullptr) {
                 if (print_debug) {
                     debug_printf("\n\t(%ld) SSA CP is replacing %s", line, tree_to_infix(t).c_str());
                     debug_printf(" with %s\n", tree_to_infix(value).c_str());

@@ -21,6 +21,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/remark.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
@@ -285,7 +286,7 @@ public:
         for (RCX* rcx = queue.pop(); rcx; rcx = queue.pop()) {
             if (++hoisted_from[rcx->common_loop] > MOST_TEMPORARIES) continue;
             if ((cost += rcx->cost) > MOST_COST) break;
-            hoist(*rcx);
+            if (rewrite_is_allowed(rcx->tree())) hoist(*rcx);
         }
         if (cost == 0) return;
         sym_split(currfuninfo);

@@ -7,6 +7,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/grammar.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "UTIL/abort.h"
 
 #include <cctype>
@@ -53,12 +54,14 @@ bool is_beyond_limit(const ROW& row) {
     static long count = 0;
     if (!pass_debug_rows || row.kind != ROW::FUNCTION) return false;
     if (count == 0) std::atexit([] { std::fprintf(stderr, "zopt: %ld runs of rows\n", count); });
+    begin_counted_rewrites(count + 1 == pass_debug_rows);
     if (++count == pass_debug_rows)
         std::fprintf(stderr, "zopt: run %ld: '%s' of %s\n", count, row.name, currfunc ? currfunc->name : "the program");
     return count > pass_debug_rows;
 }
 
 void do_work(const ROW& row, const std::string& label) {
+    if (!pass_debug_rows) begin_counted_rewrites(true);
     if (!has_work(row) || is_beyond_limit(row)) return;
     if (!row.frame || pass_debug_idle_frames || !row.frame->is_SSA_form) leave_kept_SSA_form();
     if (!row.frame || pass_debug_idle_frames) leave_kept_form();

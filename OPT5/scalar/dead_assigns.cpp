@@ -19,6 +19,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/loop_callbacks.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -201,7 +202,7 @@ private:
         if (!faint.test(static_cast<uint32_t>(bit))) live.set(static_cast<uint32_t>(bit));
     }
     bool write(int bit, bool kills) override {
-        if (!live.test(static_cast<uint32_t>(bit))) return false;
+        if (!live.test(static_cast<uint32_t>(bit)) && rewrite_is_allowed(nullptr)) return false;
         if (kills) live.clear(static_cast<uint32_t>(bit));
         return true;
     }

@@ -20,6 +20,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
 #include "OPT5/ir/trees.h"
@@ -290,7 +291,7 @@ void SWEEP::judge() {
     for (SYMTAB* s : symbols) {
         if (!candidates.count(s)) continue;
         const NODE* value = counts[s].definition->right;
-        if (reads_name_of(value, candidates)) continue;
+        if (reads_name_of(value, candidates) || !rewrite_is_allowed(counts[s].definition)) continue;
         if (s->type->is_pointer() && !currfuninfo->spmap->is_bound(s)) currfuninfo->spmap->set_pointee(s, value);
         currfuninfo->snmap->set_value(s, copy_tree(value));
         if (print_debug)

@@ -28,6 +28,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -562,7 +563,7 @@ void GLOBAL_CSE::place(std::vector<std::unique_ptr<EXPRESSION>>& expressions) {
             again.push_back(static_cast<size_t>(e.number));
             for (const TRIPLE_SITE& s : e.t.sites)
                 for_each_subtree(static_cast<const NODE*>(*s.slot), [&](const NODE* n) { held_back.insert(n); });
-        } else if (batch.decide(k)) {
+        } else if (batch.decide(k) && rewrite_is_allowed(*e.t.sites.front().slot)) {
             apply(e, batch.insertions());
         }
     }

@@ -13,6 +13,7 @@
 
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/implied_tests.h"
@@ -371,7 +372,7 @@ private:
         if (!is_test(control) || !bb->predecessors || !outcomes.ask_for(control->left)) return false;
         std::vector<DECIDED_EDGE> known;
         const bool all = find_outcomes(outcomes, bb, &known);
-        if (known.empty() || outcomes.first_that_may_change(bb)) return false;
+        if (known.empty() || outcomes.first_that_may_change(bb) || !rewrite_is_allowed(control)) return false;
         BBLK* targets[2] = {control->right->right->lbl->bblock, control->right->left->lbl->bblock};
         const bool first = known.front().outcome;
         if (all &&

@@ -17,6 +17,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
@@ -238,7 +239,7 @@ bool INCREMENTS::search_before(std::vector<LIST*>& cells, size_t end, const STEP
             has_new_temps = true;
         }
         *stop = true;
-        if (use.kind == USE::BLOCKED) return false;
+        if (use.kind == USE::BLOCKED || !rewrite_is_allowed(cell->first)) return false;
         absorb_backward(use.umult, tree, step);
         return true;
     }
@@ -367,6 +368,7 @@ bool INCREMENTS::moves_forward(BBLK* bb, LIST* cell, const STEP& step) {
     BBLK* end = nullptr;
     const USE use = search_from(bb, cell->rest, step, MOST_BLOCKS_FORWARD, &end);
     if (use.kind == USE::HIT) {
+        if (!rewrite_is_allowed(cell->first)) return false;
         absorb_forward(use.umult, cell->first, step);
         return true;
     }
@@ -419,7 +421,7 @@ bool INCREMENTS::moves_around(BBLK* latch, LIST* cell, const STEP& step) {
     if (exit->predecessors->rest && split_exits >= MOST_SPLIT_EXITS) return false;
     BBLK* end = nullptr;
     const USE use = search_from(header, header->statements, step, MOST_BLOCKS_FORWARD + 1, &end);
-    if (use.kind != USE::HIT) return false;
+    if (use.kind != USE::HIT || !rewrite_is_allowed(cell->first)) return false;
     if (print_debug)
         debug_printf("\n\tBB->DFN [%d-%d] with pre-header %d and exit %d\n"
                      "\tAssignment propagated around back edge of loop: %s\n"

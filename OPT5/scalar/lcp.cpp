@@ -17,6 +17,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -127,7 +128,7 @@ NODE* GLOBAL_ASGS::lookup_global_ASG(NODE* name) {
         if (value->op != NAME) break;
         sym = value->u.sym;
     }
-    if (!value) return name;
+    if (!value || !rewrite_is_allowed(name)) return name;
     report_replacement("\n\t============== (%ld) 'lookup_global_ASG' is replacing this:\n",
                        "\n\t============== with the following substitute:\n",
                        "\n\t=============================================\n", name, value);

@@ -23,6 +23,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -509,6 +510,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
     const VALUE v = numbers.of(t);
     OCCURRENCES& known = values[v];
     if (SYMTAB* holder = holder_of(known, v, t->type)) {
+        if (!rewrite_is_allowed(t)) return false;
         slot = coerce_to_type(t->type->stqs(), mk_NAME(holder, t->ls));
         erase_tree(t);
         return true;
@@ -522,6 +524,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
         known.order = ++order;
         return true;
     }
+    if (!rewrite_is_allowed(t)) return false;
     known.later.push_back(&slot);
     // A block further on is entered every other time.
     known.gain += std::ldexp(numbers.cost_of(t), static_cast<int>(known.block) - static_cast<int>(blocks.size()));

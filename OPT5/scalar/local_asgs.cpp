@@ -15,6 +15,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/scope.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
@@ -157,7 +158,7 @@ NODE* LOCAL_ASGS::lookup_ASG(NODE* name) {
     const NAMED& known = at->second;
     if (known.depnum != depnums[name->u.sym]) return name;
     if (known.value->op == NAME && known.source_depnum != depnums[known.value->u.sym]) return name;
-    if (in_test && known.value->op == NAME) return name;
+    if ((in_test && known.value->op == NAME) || !rewrite_is_allowed(name)) return name;
     report_local_replacement("\n\t========== (%ld) 'lookup_ASG' is replacing this:\n", name, known.value);
     any = true;
     return value_in_place_of(name, known.value);

@@ -1,6 +1,7 @@
 // The matcher of patterns.def: finds the rows that apply to a node and builds their right sides.
 
 #include "OPT5/simp/patterns.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/simp/algebra.h"
 #include "OPT5/simp/exact.h"
 #include "OPT5/simp/minmax.h"
@@ -379,7 +380,7 @@ NODE* rewritten(const PATTERN& p, NODE* t, struct LOOP* loop) {
     found.loop = loop;
     NODE* root = t;
     if (!MATCHER(p, found).match(p.left, &root, nullptr)) return nullptr;
-    if (!rows[p.row].condition(found) || !has_types(p, found)) return nullptr;
+    if (!rows[p.row].condition(found) || !has_types(p, found) || !rewrite_is_allowed(t)) return nullptr;
     if (pattern_hits) __atomic_fetch_add(&pattern_hits[p.row], 1, __ATOMIC_RELAXED);
     TYPE* type = t->type;
     NODE* r = BUILDER(p, found).build(p.right);

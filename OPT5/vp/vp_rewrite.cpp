@@ -15,6 +15,7 @@
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/exact.h"
@@ -90,7 +91,7 @@ private:
         if (!known) return t;
         informed = true;
         if (!vpset_is_single(*known) || !is_integer(t->type) || t->u.sym == kept || t->type->size != t->u.sym->type->size ||
-            is_optimizer_temp(t->u.sym->name, 'K', 'Q'))
+            is_optimizer_temp(t->u.sym->name, 'K', 'Q') || !rewrite_is_allowed(t))
             return t;
         NODE* value = mk_ICON(to_int65(vpset_minimum(*known)), t->type->stqs());
         erase_node(t);
@@ -156,7 +157,7 @@ private:
         const vpset s = vpset_of_tree(test, env);
         if (vpset_is_empty(s) || !test->type->is_int() || (s.holds(0) && !vpset_is_single(s))) return t;
         const bool holds = !s.holds(0);
-        if (test->op == ICON) return t;
+        if (test->op == ICON || !rewrite_is_allowed(t)) return t;
         NODE* constant = mk_COMMAOP(peel_for_effect(test), mk_ICON(INT65(holds ? 1 : 0), tp->int_t));
         changed = true;
         if (t == test) return constant;

@@ -89,7 +89,7 @@ class Parser(c_parser.CParser):
             p[0] += p[2] or []
 
 
-def parse(path, include_dirs, defines, eabi, warn):
+def parse(path, include_dirs, defines, eabi, warn=lambda where, text: None):
     """The syntax tree of a source file; `warn` takes a position and a text."""
     if not os.path.isfile(path):
         raise CompileError(None, f"cannot read {path}")

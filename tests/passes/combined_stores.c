@@ -64,7 +64,7 @@ void seen_by_pointer(void) {
 // Of a double that is no wider than a float the one access tells the declared type, the other does not.
 // FUNCTION: seen_as_double
 // HAS: *($O$N0 + 14) = x
-// HAS: *($O$N0 + 14) = *(a + PMCONV((long)(i * 3), 32) + 2) * 0x1p-1
+// HAS: *($O$N0 + 14) = *(a + PMCONV((long)(i * 3), 32) + 2) * 0.5
 static double reals[16];
 void seen_as_double(const double* a, int i, long l, float x) {
     reals[l + 7] = x;

@@ -3,6 +3,11 @@
 // Operators that C has are written as in C, with the parentheses that C would need; the others as calls by their names.
 #include "tools/model/ic_print.h"
 
+#include <charconv>
+#include <cmath>
+#include <cstdlib>
+#include <iterator>
+
 using namespace if_op;
 
 namespace {
@@ -181,6 +186,19 @@ void PRINTER::string_constant(const IC_NODE* t) {
     text += '"';
 }
 
+// The fewest decimal digits that read back as the same value, however the file spells it.
+std::string float_text(const char* spelled, bool is_single) {
+    char* end = nullptr;
+    const double value = is_single ? static_cast<double>(std::strtof(spelled, &end)) : std::strtod(spelled, &end);
+    if (*end || !std::isfinite(value)) return spelled;
+    char digits[40];
+    const std::to_chars_result done = is_single ? std::to_chars(digits, std::end(digits), static_cast<float>(value))
+                                                : std::to_chars(digits, std::end(digits), value);
+    std::string text(digits, done.ptr);
+    if (text.find_first_of(".e") == std::string::npos) text += ".0";
+    return text;
+}
+
 void PRINTER::leaf(const IC_NODE* t) {
     switch (t->op) {
     case LABEL: return label(t);
@@ -188,7 +206,7 @@ void PRINTER::leaf(const IC_NODE* t) {
     case SCON: return string_constant(t);
     case ICON: text += std::to_string(t->value); return;
     case FCON:
-    case LCON: text += t->text; return;
+    case LCON: text += float_text(t->text, t->type && t->type->size == 32); return;
     case FIELD:
         text += t->member->name.empty() ? "(unnamed " + std::to_string(t->member->ordinal) + ")" : t->member->name;
         return;

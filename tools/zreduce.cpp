@@ -280,23 +280,24 @@ int REDUCER::run() {
     return 0;
 }
 
-int usage() {
-    std::fprintf(stderr, "usage: zreduce [--steps N] IN OUT -- COMMAND [WORD]...\n"
-                         "  makes the I-file smaller while the command, with {} for the file, keeps its status\n"
-                         "  --steps N   trials at most (100000)\n");
-    return TROUBLE;
+int usage(FILE* out) {
+    std::fprintf(out, "usage: zreduce [--steps N] IN OUT -- COMMAND [WORD]...\n"
+                      "  makes the I-file smaller while the command, with {} for the file, keeps its status\n"
+                      "  --steps N   trials at most (100000)\n");
+    return out == stdout ? 0 : TROUBLE;
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
     std::vector<std::string> words(argv + 1, argv + argc);
+    if (words.size() == 1 && words[0] == "--help") return usage(stdout);
     long most = 100000;
     if (words.size() > 1 && words[0] == "--steps") {
         most = std::strtol(words[1].c_str(), nullptr, 10);
         words.erase(words.begin(), words.begin() + 2);
     }
-    if (words.size() < 4 || words[2] != "--" || most <= 0) return usage();
+    if (words.size() < 4 || words[2] != "--" || most <= 0) return usage(stderr);
     FILE* const in = std::fopen(words[0].c_str(), "rb");
     if (!in) {
         std::fprintf(stderr, "zreduce: %s cannot be opened\n", words[0].c_str());

@@ -48,7 +48,7 @@ TEST(records, every_payload_by_opcode) {
         {node(3, 1, un(0)), "\"\""},
         {node(4, 1, by({0x7F})), "-1"},
         {node(4, 8, un(UINT32_MAX)), "4294967295"},
-        {node(5, 7, str("1.5e3")), "1.5e3"},
+        {node(5, 7, str("1.5e3")), "1500.0"},
         {node(25, 6, str("-99999999999")), "-99999999999"},
         {node(68, 1) + s + node(26, 1, by({1, 2, 9})), "(*2).b"},
         {node(40, 1, un(1)) + v + node(56, 1) + node(47, 1) + one + node(1, 0, by({5})) + node(46, 1) +

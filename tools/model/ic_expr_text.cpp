@@ -6,6 +6,7 @@
 #include <charconv>
 #include <cmath>
 #include <cstdlib>
+#include <cstring>
 #include <iterator>
 
 using namespace if_op;
@@ -186,8 +187,9 @@ void PRINTER::string_constant(const IC_NODE* t) {
     text += '"';
 }
 
-// The fewest decimal digits that read back as the same value, however the file spells it.
+// The fewest decimal digits that read back as the same value, however the file spells it. Wide integers stay.
 std::string float_text(const char* spelled, bool is_single) {
+    if (!std::strpbrk(spelled, ".eExXpP")) return spelled;
     char* end = nullptr;
     const double value = is_single ? static_cast<double>(std::strtof(spelled, &end)) : std::strtod(spelled, &end);
     if (*end || !std::isfinite(value)) return spelled;

@@ -10,6 +10,7 @@
 #include "OPT5/ir/list.h"
 
 #include <string>
+#include <vector>
 
 // acc += a*b - c*d + e becomes acc += a*b, acc -= c*d, acc += e: one statement behind the other. Whether it was split.
 // Sums of floating-point numbers are split where the program allows them to be regrouped.
@@ -32,3 +33,22 @@ bool is_mac(const NODE* statement);
 bool is_mac_of_halves(const NODE* statement); // of 16-bit factors, into an integer
 // Why the sum `statement`, into its left side, of something with a multiplication is not such a one; empty if it is.
 std::string why_no_mac(const NODE* statement);
+
+// ---- Loops
+
+// x = x + c of a variable.
+struct VARIABLE_STEP {
+    SYMTAB* sym = nullptr;
+    INT65 c = 0;
+};
+bool read_variable_step(const NODE* statement, VARIABLE_STEP* step);
+NODE* value_behind_step(const VARIABLE_STEP& step, INT65 c); // x + c
+
+// A block that is its own successor, and has one other.
+struct MAC_LOOP {
+    BBLK* block = nullptr;
+    BBLK* exit = nullptr;
+    std::vector<BBLK*> entries; // predecessors outside the loop
+};
+// Multiplies for the next iteration where that leads to a call; whether it did. Blocks are new then, and not numbered.
+bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop);

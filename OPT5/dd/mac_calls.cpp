@@ -397,3 +397,25 @@ bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell) {
     set_call(cell, "__dmac", args);
     return true;
 }
+
+// ---- Steps
+
+bool read_variable_step(const NODE* t, VARIABLE_STEP* step) {
+    if ((t->op != ASG && t->op != PLUSASG && t->op != MINUSASG) || t->left->op != NAME) return false;
+    const NODE* sum = t->op == ASG ? t->right : t;
+    if (t->op == ASG && sum->op != PLUS && sum->op != MINUS) return false;
+    if (sum->left->op != NAME || sum->left->u.sym != t->left->u.sym || sum->right->op != ICON) return false;
+    TYPE* type = t->left->type;
+    const bool is_in_its_type = type->is_pointer() || (t->op == ASG ? equiv_mtypes(sum->type, type)
+                                                                    : compound_ASG_computes_in(type, t->op, t->left, t->right));
+    if (!is_in_its_type) return false;
+    const bool subtracts = sum->op == MINUS || sum->op == MINUSASG;
+    step->sym = t->left->u.sym;
+    step->c = subtracts ? -sum->right->u.lval : sum->right->u.lval;
+    return true;
+}
+
+NODE* value_behind_step(const VARIABLE_STEP& step, INT65 c) {
+    TYPE* type = step.sym->type->stqs();
+    return maketree(PLUS, mk_NAME(step.sym), mk_ICON(c, type->is_pointer() ? tp->long_t : type), type);
+}

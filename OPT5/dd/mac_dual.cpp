@@ -36,27 +36,12 @@ namespace {
 
 constexpr unsigned WORD = 32; // bits that both halves take
 
-// x = x + c of a variable.
-struct STEP {
-    SYMTAB* sym;
-    INT65 c;
-    bool is_ahead; // of the accumulation, in its block
+// Of the block's steps one is made ahead of the accumulation or behind it.
+struct STEP : VARIABLE_STEP {
+    bool is_ahead = false;
 };
 
-bool read_step(const NODE* t, STEP* step) {
-    if ((t->op != ASG && t->op != PLUSASG && t->op != MINUSASG) || t->left->op != NAME) return false;
-    const NODE* sum = t->op == ASG ? t->right : t;
-    if (t->op == ASG && sum->op != PLUS && sum->op != MINUS) return false;
-    if (sum->left->op != NAME || sum->left->u.sym != t->left->u.sym || sum->right->op != ICON) return false;
-    const bool subtracts = sum->op == MINUS || sum->op == MINUSASG;
-    *step = {t->left->u.sym, subtracts ? -sum->right->u.lval : sum->right->u.lval, false};
-    return true;
-}
-
-NODE* sum_of(const STEP& step, INT65 times) {
-    TYPE* type = step.sym->type->stqs();
-    return maketree(PLUS, mk_NAME(step.sym), mk_ICON(step.c * times, type->is_pointer() ? tp->long_t : type), type);
-}
+NODE* sum_of(const STEP& step, INT65 times) { return value_behind_step(step, step.c * times); }
 
 class DUAL_LOOP {
 public:
@@ -124,7 +109,7 @@ std::vector<const SYMTAB*> words_in(const BBLK* bb) {
     };
     for (const LIST* s = bb->statements; s; s = s->rest) {
         STEP step;
-        const bool moves = read_step(s->first, &step) && (step.c % INT65(2)).is_zero();
+        const bool moves = read_variable_step(s->first, &step) && (step.c % INT65(2)).is_zero();
         for_each_written_name(s->first, [&](const NODE* name, const NODE*) {
             (moves && !holds(words, name->u.sym) ? words : others).push_back(name->u.sym);
         });
@@ -171,7 +156,7 @@ const NODE* DUAL_LOOP::only_mac(std::vector<STEP>& steps) const {
             mac = s->first;
             continue;
         }
-        if (!read_step(s->first, &step)) return nullptr;
+        if (!read_variable_step(s->first, &step)) return nullptr;
         for (const STEP& other : steps)
             if (other.sym == step.sym) return nullptr;
         step.is_ahead = !mac;

@@ -35,14 +35,9 @@ namespace {
 
 register_option pass_disable_simple_rotation("disable:simple_rotation");
 
-struct ROTATION {
-    BBLK* block;
-    BBLK* exit = nullptr;
-    std::vector<BBLK*> entries; // predecessors outside the loop
-};
+constexpr int LEAST_GOAL_TO_SPECULATE = 3; // of `size_speed_goal`: the rest of the body is copied
 
-// A block that is its own successor, and has one other.
-bool find_rotation(BBLK* bb, ROTATION* r) {
+bool find_rotation(BBLK* bb, MAC_LOOP* r) {
     const EDGE* e = bb->successors;
     if (!e || !e->rest || e->rest->rest || ends_in_promise(bb)) return false;
     if (e->first != bb && e->rest->first != bb) return false;
@@ -188,7 +183,7 @@ bool is_in_cycle(BBLK* bb) {
 std::string why_not_rotated(BBLK* bb, const LIST* cell, int products) {
     std::string why = why_no_mac(cell->first);
     if (!why.empty()) return why;
-    if (ROTATION r; !find_rotation(bb, &r)) return "the loop has more than one block: take if, ?: and calls out of it";
+    if (MAC_LOOP r; !find_rotation(bb, &r)) return "the loop has more than one block: take if, ?: and calls out of it";
     if (!multiplies_once(bb))
         return "there are " + std::to_string(products) +
                " multiplications an iteration and one multiplier: make a loop of each sum";
@@ -243,18 +238,22 @@ public:
     void run();
 
 private:
-    void rotate(ROTATION& r);
-    void rotate(ROTATION& r, LIST* cell);
+    void rotate(MAC_LOOP& r);
+    bool simply(MAC_LOOP& r);
+    bool simply(MAC_LOOP& r, LIST* cell);
 
     MENTIONS mentions;
     bool has_new_temps = false, has_new_blocks = false;
 };
 
 // The statement becomes `acc op= t` and `t = product`, or the call of both.
-void ROTATOR::rotate(ROTATION& r, LIST* cell) {
+bool ROTATOR::simply(MAC_LOOP& r, LIST* cell) {
     LIST* pair = mkelist(copy_tree(cell->first), nullptr, cell->psn);
     SYMTAB* temp = split_out_multiply(pair);
-    if (!temp) return erase_tree_list(pair);
+    if (!temp) {
+        erase_tree_list(pair);
+        return false;
+    }
     std::swap(pair->first, pair->rest->first);
     NODE* late = copy_tree(pair->first);
     NODE* zero = mk_ASG(mk_NAME(temp), neutral(late));
@@ -265,7 +264,7 @@ void ROTATOR::rotate(ROTATION& r, LIST* cell) {
         erase_tree_list(pair);
         erase_tree(late);
         erase_tree(zero);
-        return;
+        return false;
     }
     erase_tree(cell->first);
     cell->first = std::exchange(pair->first, nullptr);
@@ -279,21 +278,30 @@ void ROTATOR::rotate(ROTATION& r, LIST* cell) {
     }
     insert_before(&r.exit->statements, late, cell->psn);
     has_new_temps = true;
+    return true;
 }
 
-void ROTATOR::rotate(ROTATION& r) {
+bool ROTATOR::simply(MAC_LOOP& r) {
+    bool any = false;
     split_accumulations_in_bb(r.block);
     read_square_from_memory(r.block, mentions);
     for (LIST* s = r.block->statements; s->rest; s = s->rest)
-        if (is_mac(s->first) && may_be_late(r.block, s) && rewrite_is_allowed(s->first)) rotate(r, s);
+        if (is_mac(s->first) && may_be_late(r.block, s) && rewrite_is_allowed(s->first)) any |= simply(r, s);
+    return any;
+}
+
+void ROTATOR::rotate(MAC_LOOP& r) {
+    if (!pass_disable_simple_rotation && simply(r)) return;
+    if (size_speed_goal() < LEAST_GOAL_TO_SPECULATE || !speculatively_rotate_loop_for_accumulators(r)) return;
+    has_new_temps = has_new_blocks = true;
 }
 
 void ROTATOR::run() {
     std::vector<BBLK*> blocks;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
     for (BBLK* bb : blocks) {
-        ROTATION r;
-        if (!pass_disable_simple_rotation && find_rotation(bb, &r) && multiplies_once(bb)) rotate(r);
+        MAC_LOOP r;
+        if (find_rotation(bb, &r) && multiplies_once(bb)) rotate(r);
     }
     if (remarks_are_wanted)
         for (BBLK* bb : blocks)

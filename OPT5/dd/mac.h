@@ -50,5 +50,10 @@ struct MAC_LOOP {
     BBLK* exit = nullptr;
     std::vector<BBLK*> entries; // predecessors outside the loop
 };
+// The multiplications of the block, as the multiplier counts them.
+int multiplications_in(const BBLK* bb);
+// Loops that accumulate one product an iteration, and choose values by branches, choose them without. Whether the graph
+// changed, which is to be simplified then.
+bool straighten_loops_of_accumulators();
 // Multiplies for the next iteration where that leads to a call; whether it did. Blocks are new then, and not numbered.
 bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop);

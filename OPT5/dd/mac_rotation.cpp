@@ -22,6 +22,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
+#include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/accumulators.h"
 
@@ -77,15 +78,21 @@ bool is_sum_into_target(const NODE* t) {
             trees_are_congruent(t->left, t->right->right, false));
 }
 
-// The multiplier is one: a block with more to multiply is no rotation's.
-bool multiplies_once(const BBLK* bb) {
+} // namespace
+
+int multiplications_in(const BBLK* bb) {
     int total = 0;
     for (const LIST* s = bb->statements; s; s = s->rest) {
         const int count = count_multiplies(s->first, false);
         total += count == 2 && is_sum_into_target(s->first) && doubles(s->first->right) ? 1 : count;
     }
-    return total == 1;
+    return total;
 }
+
+namespace {
+
+// The multiplier is one: a block with more to multiply is no rotation's.
+bool multiplies_once(const BBLK* bb) { return multiplications_in(bb) == 1; }
 
 // ---- One accumulation
 
@@ -297,6 +304,11 @@ void ROTATOR::rotate(MAC_LOOP& r) {
 }
 
 void ROTATOR::run() {
+    if (straighten_loops_of_accumulators()) {
+        changed(fact::none);
+        simpcfg(false, false);
+        need(fact::alias_marks);
+    }
     std::vector<BBLK*> blocks;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
     for (BBLK* bb : blocks) {

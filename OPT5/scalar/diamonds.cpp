@@ -172,9 +172,15 @@ bool join_extremum(BBLK* bb, LIST* test, BBLK* arm, BBLK* join, bool holds) {
     return true;
 }
 
-bool join_diamond(BBLK* bb) {
+// The cell of the test that ends the block; null if none does.
+LIST* test_of(const BBLK* bb) {
     LIST* test = bb->last_statement();
-    if (!test || test->first->op != IF || test->first->left->op == ENDLOOP || bb->is_in_LIR_form()) return false;
+    return !test || test->first->op != IF || test->first->left->op == ENDLOOP || bb->is_in_LIR_form() ? nullptr : test;
+}
+
+bool join_diamond(BBLK* bb) {
+    LIST* test = test_of(bb);
+    if (!test) return false;
     const NODE* targets = test->first->right;
     BBLK *on_true = arm_of(targets->left, bb), *on_false = arm_of(targets->right, bb);
     if (on_true && on_false && on_true != on_false)
@@ -183,7 +189,59 @@ bool join_diamond(BBLK* bb) {
            join_extremum(bb, test, on_false, targets->left->lbl->bblock, false);
 }
 
+// The plain assignment that is the one arm of the block's test, where the other edge leads to where the arm ends.
+struct LONE_ARM {
+    BBLK *block = nullptr, *join = nullptr;
+    NODE* asg = nullptr;
+    bool holds = false; // it is taken where the condition holds
+};
+
+bool find_lone_arm(const BBLK* bb, LONE_ARM* arm) {
+    const LIST* test = test_of(bb);
+    if (!test || tree_has_side_effects(test->first->left)) return false;
+    const NODE* targets = test->first->right;
+    for (bool holds : {true, false}) {
+        BBLK *block = arm_of(holds ? targets->left : targets->right, bb), *join = (holds ? targets->right : targets->left)->lbl->bblock;
+        if (!block || block == join || sole_successor(block) != join) continue;
+        NODE* asg = sole_plain_assignment(block);
+        if (!asg || !may_be_arm_of_select(asg)) return false;
+        *arm = {block, join, asg, holds};
+        return true;
+    }
+    return false;
+}
+
+bool are_two_arms(const BBLK* bb) {
+    const LIST* test = test_of(bb);
+    if (!test) return false;
+    const NODE* targets = test->first->right;
+    const BBLK *a = arm_of(targets->left, bb), *b = arm_of(targets->right, bb);
+    if (!a || !b || a == b || !sole_successor(a) || sole_successor(a) != sole_successor(b)) return false;
+    const NODE *x = sole_plain_assignment(a), *y = sole_plain_assignment(b);
+    return x && y && trees_are_congruent(x->left, y->left, false);
+}
+
 } // namespace
+
+bool is_choice_of_value(const BBLK* bb) {
+    LONE_ARM arm;
+    return are_two_arms(bb) || find_lone_arm(bb, &arm);
+}
+
+bool choose_value(BBLK* bb) {
+    if (join_diamond(bb)) return true;
+    LONE_ARM arm;
+    if (!find_lone_arm(bb, &arm)) return false;
+    LIST* test = bb->last_statement();
+    const NODE *a = arm.asg->right, *b = arm.asg->left;
+    if (!arm.holds) std::swap(a, b);
+    NODE* value = make_select(test->first->left, a, b, arm.asg->left->type);
+    NODE* statement = mk_ASG(copy_tree(arm.asg->left), value);
+    drop_arm(bb, arm.block);
+    disconnect(bb, arm.join);
+    replace_test(bb, test, statement, arm.join);
+    return true;
+}
 
 bool may_be_arm_of_select(const NODE* t) { return t->op == ASG && is_plain_target(t->left) && is_plain_arm(t->right); }
 

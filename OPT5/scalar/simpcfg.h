@@ -57,3 +57,7 @@ bool skip_decided_entry_tests();
 void lay_out_blocks();
 bool join_diamonds();
 bool may_be_arm_of_select(const NODE* assignment); // cheap, and safe where the condition does not hold
+// The block ends in a test of which variable, or which of two values of one, is to be assigned: the arms are single
+// assignments of that kind. `choose_value` makes a statement of it, whether or not the target has an instruction for it.
+bool is_choice_of_value(const BBLK* bb);
+bool choose_value(BBLK* bb);

@@ -22,6 +22,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
+#include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/accumulators.h"
@@ -250,7 +251,7 @@ private:
     bool simply(MAC_LOOP& r, LIST* cell);
 
     MENTIONS mentions;
-    bool has_new_temps = false, has_new_blocks = false;
+    bool has_new_temps = false, has_new_blocks = false, has_peeled = false;
 };
 
 // The statement becomes `acc op= t` and `t = product`, or the call of both.
@@ -300,7 +301,7 @@ bool ROTATOR::simply(MAC_LOOP& r) {
 void ROTATOR::rotate(MAC_LOOP& r) {
     if (!pass_disable_simple_rotation && simply(r)) return;
     if (size_speed_goal() < LEAST_GOAL_TO_SPECULATE || !speculatively_rotate_loop_for_accumulators(r)) return;
-    has_new_temps = has_new_blocks = true;
+    has_new_temps = has_new_blocks = has_peeled = true;
 }
 
 void ROTATOR::run() {
@@ -320,6 +321,11 @@ void ROTATOR::run() {
             if (is_in_cycle(bb)) tell_of_block(bb);
     if (has_new_temps) sym_split(currfuninfo);
     changed(has_new_blocks ? fact::none : fact::graph);
+    // Behind the last iteration nobody may want its steps.
+    if (!has_peeled) return;
+    need(fact::live_variables);
+    elim_dead_assigns(0, 0);
+    changed(fact::graph);
 }
 
 } // namespace

@@ -10,6 +10,7 @@
 #include "OPT5/ir/list.h"
 
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 // acc += a*b - c*d + e becomes acc += a*b, acc -= c*d, acc += e: one statement behind the other. Whether it was split.
@@ -55,5 +56,62 @@ int multiplications_in(const BBLK* bb);
 // Loops that accumulate one product an iteration, and choose values by branches, choose them without. Whether the graph
 // changed, which is to be simplified then.
 bool straighten_loops_of_accumulators();
+// Whether evaluating the tree may leave the function, or is an act that keeps its place.
+bool may_leave(const NODE* t);
+void drop_statements(BBLK* bb, const std::vector<const NODE*>& trees); // those of the list
+
+// A sum in memory that nothing else in the loop reaches: a variable has it there, for as long as that is no variable.
+class SUM_IN_MEMORY {
+public:
+    explicit SUM_IN_MEMORY(MAC_LOOP& loop) : loop(loop) {}
+    bool keep_in_variable(); // the one that multiplies; the loop's neighbours may be new then
+    void drop();             // what was put around the loop
+
+private:
+    bool is_alone(const LIST* cell) const;
+
+    MAC_LOOP& loop;
+    std::vector<const NODE*> around;
+};
+
+// Takes the statement past those behind it, as far as that changes nothing, but not past `stop`; where it is then.
+LIST* move_statement_down(LIST* cell, const LIST* stop);
+
+// `s = *x; acc += s * s;`, as a load that is needed twice was kept, becomes `acc += *x * *x;`: the hardware squares what it
+// loads. For one run over a function.
+class SQUARES {
+public:
+    void read_from_memory(LIST* statements);
+
+private:
+    bool is_read_here_alone(const SYMTAB* sym);
+    bool read_from_memory(LIST* load, LIST* sum);
+
+    std::unordered_map<const SYMTAB*, int> mentions; // looked up alone; found when it is first asked for
+};
+
+// Products in the addresses of a block that is a loop, of one variable that steps and one that stays, or of two that stay:
+// the multiplier is free of them where they step by themselves.
+class SUBSCRIPTS {
+public:
+    explicit SUBSCRIPTS(const MAC_LOOP& loop) : loop(loop) {}
+    void step(int count); // that many, or none
+    void drop();          // what was put ahead of the loop
+
+private:
+    struct PRODUCT {
+        SYMTAB *steps, *stays, *value;
+        TYPE* type;
+    };
+    bool read(const NODE* t, PRODUCT* product) const;
+    LIST* only_change_of(const SYMTAB* sym, bool* any) const;
+    void put_ahead(NODE* asg);
+    void begin(PRODUCT& product);
+
+    const MAC_LOOP& loop;
+    std::vector<PRODUCT> products;
+    std::vector<const NODE*> ahead;
+};
+
 // Multiplies for the next iteration where that leads to a call; whether it did. Blocks are new then, and not numbered.
-bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop);
+bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop, SQUARES& squares);

@@ -42,6 +42,12 @@ const NODE* without_conversion(const NODE* t, uint64_t to, uint64_t from) {
 }
 
 bool is_loaded(const NODE* t, uint64_t bits) { return t->op == UMULT && is_signed(t->type, bits); }
+// A constant was converted where it was read.
+bool is_a_constant_of(const NODE* t, uint64_t wide, uint64_t bits) {
+    if (t->op != ICON || !is_signed(t->type, wide)) return false;
+    const INT65 end = INT65(1) << INT65(static_cast<int64_t>(bits - 1));
+    return t->u.lval >= -end && t->u.lval < end;
+}
 bool is_accumulation(const NODE* t) {
     return (t->op == PLUSASG || t->op == MINUSASG) && is_a_likely_zelkova_accumulator(t->left, false);
 }
@@ -69,6 +75,7 @@ struct PRODUCT {
 bool has_factors(const NODE* m, uint64_t wide, uint64_t bits) {
     if (m->op != MULT) return false;
     const NODE *a = without_conversion(m->left, wide, bits), *b = without_conversion(m->right, wide, bits);
+    if (bits == 16 && is_a_constant_of(b, wide, bits)) return is_loaded(a, bits);
     return is_signed(a->type, bits) && is_signed(b->type, bits) && (is_loaded(a, bits) || is_loaded(b, bits));
 }
 
@@ -298,6 +305,7 @@ bool convert_product(LIST* cell, PAIR& pair) {
     const bool is_square = bits == 16 && trees_are_congruent(*a, *b, false) && !lvalue_is_volatile(*a);
     NODE *x = take(a), *y = take(b);
     order_factors(&x, &y, bits);
+    if (y->op == ICON && bits == 16) y->type = tp->int_t;
     NODE *acc = reference_to(pair.accm->left), *p = reference_to(pair.mult->left);
     NODE* shift = mk_ICON(pair.shift, tp->int_t);
     std::string name = is_square ? "__parallel_sqr_" : "__parallel_mpy_";

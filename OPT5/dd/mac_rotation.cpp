@@ -29,7 +29,6 @@
 
 #include <algorithm>
 #include <string>
-#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -110,65 +109,6 @@ bool may_be_late(const BBLK* bb, const LIST* cell) {
     return true;
 }
 
-// ---- Squares
-
-using MENTIONS = std::unordered_map<const SYMTAB*, int>; // looked up alone
-
-MENTIONS mentions_of_variables() {
-    MENTIONS found;
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            for_each_subtree(static_cast<const NODE*>(s->first), [&found](const NODE* n) {
-                if (n->op == NAME) ++found[n->u.sym];
-            });
-    return found;
-}
-
-// A variable that the tree multiplies by itself.
-const SYMTAB* squared_variable(const NODE* t) {
-    const SYMTAB* sym = nullptr;
-    for_each_subtree(t, [&sym](const NODE* n) {
-        if (n->op != MULT) return;
-        const NODE *a = n->left, *b = n->right;
-        while (a->op == SCONV) a = a->left;
-        while (b->op == SCONV) b = b->left;
-        if (a->op == NAME && b->op == NAME && a->u.sym == b->u.sym) sym = a->u.sym;
-    });
-    return sym;
-}
-
-// `s = *x; acc += s * s;`, as a load that is needed twice was kept: the hardware squares what it loads.
-// `mentions` is found where it is asked for first: what rotations add names no such variable.
-void read_square_from_memory(BBLK* bb, MENTIONS& mentions) {
-    for (LIST** link = &bb->statements; (*link)->rest && (*link)->rest->rest; link = &(*link)->rest) {
-        const NODE* load = (*link)->first;
-        NODE* t = (*link)->rest->first;
-        if (load->op != ASG || load->left->op != NAME || load->right->op != UMULT || !is_sum_into_target(t)) continue;
-        if (!load->right->type->is_int() || load->right->type->size != 16 || tree_has_side_effects(load->right))
-            continue;
-        SYMTAB* sym = load->left->u.sym;
-        if (squared_variable(t->right) != sym || !is_a_likely_zelkova_register(sym) ||
-            lvalue_is_volatile(load->right) || !equiv_mtypes(load->left->type, load->right->type))
-            continue;
-        if (mentions.empty()) mentions = mentions_of_variables();
-        NODE* name = mk_NAME(sym);
-        if (mentions[sym] != 3 || count_lvalues_in_tree(t, name) != 2) { // the load, and both factors
-            erase_tree(name);
-            continue;
-        }
-        NODE* square = copy_tree(t);
-        square->right = subst_tree_for_lvalue_in_tree(load->right, name, square->right);
-        erase_tree(name);
-        std::swap(square, (*link)->rest->first);
-        if (is_mac((*link)->rest->first) && may_be_late(bb, (*link)->rest)) {
-            drop_statement(link);
-        } else
-            std::swap(square, (*link)->rest->first);
-        erase_tree(square);
-        return;
-    }
-}
-
 // ---- What the programmer is told
 
 constexpr char PASS[] = "multiply-accumulate";
@@ -246,11 +186,11 @@ public:
     void run();
 
 private:
-    void rotate(MAC_LOOP& r);
+    void rotate(BBLK* bb);
     bool simply(MAC_LOOP& r);
     bool simply(MAC_LOOP& r, LIST* cell);
 
-    MENTIONS mentions;
+    SQUARES squares;
     bool has_new_temps = false, has_new_blocks = false, has_peeled = false;
 };
 
@@ -285,23 +225,43 @@ bool ROTATOR::simply(MAC_LOOP& r, LIST* cell) {
         has_new_blocks = true;
     }
     insert_before(&r.exit->statements, late, cell->psn);
-    has_new_temps = true;
     return true;
 }
 
 bool ROTATOR::simply(MAC_LOOP& r) {
     bool any = false;
     split_accumulations_in_bb(r.block);
-    read_square_from_memory(r.block, mentions);
+    squares.read_from_memory(r.block->statements);
     for (LIST* s = r.block->statements; s->rest; s = s->rest)
         if (is_mac(s->first) && may_be_late(r.block, s) && rewrite_is_allowed(s->first)) any |= simply(r, s);
     return any;
 }
 
-void ROTATOR::rotate(MAC_LOOP& r) {
-    if (!pass_disable_simple_rotation && simply(r)) return;
-    if (size_speed_goal() < LEAST_GOAL_TO_SPECULATE || !speculatively_rotate_loop_for_accumulators(r)) return;
-    has_new_temps = has_new_blocks = has_peeled = true;
+// A block that is not rotated stays as it was.
+void ROTATOR::rotate(BBLK* bb) {
+    MAC_LOOP r;
+    if (!find_rotation(bb, &r) || !multiplications_in(bb)) return;
+    LIST* before = copy_dd_statements(bb->statements);
+    SUM_IN_MEMORY sum(r);
+    SUBSCRIPTS subscripts(r);
+    has_new_blocks |= sum.keep_in_variable();
+    if (!multiplies_once(bb)) subscripts.step(multiplications_in(bb) - 1);
+    bool is_rotated = false, is_peeled = false;
+    if (multiplies_once(bb)) {
+        is_rotated = !pass_disable_simple_rotation && simply(r);
+        if (!is_rotated && size_speed_goal() >= LEAST_GOAL_TO_SPECULATE)
+            is_rotated = is_peeled = speculatively_rotate_loop_for_accumulators(r, squares);
+    }
+    if (is_rotated) {
+        has_new_temps = true;
+        has_new_blocks |= is_peeled;
+        has_peeled |= is_peeled;
+        return erase_tree_list(before);
+    }
+    sum.drop();
+    subscripts.drop();
+    erase_statements(bb);
+    set_statements(bb, before);
 }
 
 void ROTATOR::run() {
@@ -312,10 +272,7 @@ void ROTATOR::run() {
     }
     std::vector<BBLK*> blocks;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
-    for (BBLK* bb : blocks) {
-        MAC_LOOP r;
-        if (find_rotation(bb, &r) && multiplies_once(bb)) rotate(r);
-    }
+    for (BBLK* bb : blocks) rotate(bb);
     if (remarks_are_wanted)
         for (BBLK* bb : blocks)
             if (is_in_cycle(bb)) tell_of_block(bb);

@@ -86,13 +86,16 @@ bool exchange(LIST* first, LIST* second, bool up) {
     return true;
 }
 
-// Takes the statement past those behind it, as far as that changes nothing, but not past `stop`; where it is then.
+} // namespace
+
 LIST* move_statement_down(LIST* cell, const LIST* stop) {
     while (cell->rest != stop && exchange(cell, cell->rest, false)) cell = cell->rest;
     return cell;
 }
 
-// The same of the last statement of the list, upwards.
+namespace {
+
+// The last statement of the list, upwards.
 LIST* move_last_up(LIST* list, const LIST* stop) {
     std::vector<LIST*> cells;
     for (LIST* s = list; s; s = s->rest) cells.push_back(s);
@@ -105,7 +108,7 @@ LIST* move_last_up(LIST* list, const LIST* stop) {
 
 class SPECULATION {
 public:
-    explicit SPECULATION(const MAC_LOOP& loop) : loop(loop) {}
+    SPECULATION(const MAC_LOOP& loop, SQUARES& squares) : loop(loop), squares(squares) {}
     bool succeeds();
 
 private:
@@ -121,19 +124,13 @@ private:
     void drop();
 
     MAC_LOOP loop;
+    SQUARES& squares;
     LIST* prologue = nullptr; // ends in the multiplication
     LIST* rest = nullptr;     // begins with the accumulation; without the test
     LIST* kernel = nullptr;
     SYMTAB* temp = nullptr;
     NODE* test = nullptr;     // of the iteration whose prologue is through
 };
-
-bool may_leave(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) {
-        if (n->op == PPRAGMA || n->op == ASM) return true;
-        return op_is_call(n->op) && !pure_callee(n);
-    });
-}
 
 bool SPECULATION::may_be_cut() const {
     const BBLK* bb = loop.block;
@@ -150,6 +147,7 @@ bool SPECULATION::may_be_cut() const {
 bool SPECULATION::cut() {
     LIST* body = copy_of(loop.block->statements, loop.block->last_statement());
     for (LIST* s = body; s; s = s->rest) split_accumulations_in_stmt(s);
+    squares.read_from_memory(body);
     LIST* cell = body;
     while (cell && !is_mac(cell->first)) cell = cell->rest;
     if (cell) temp = split_out_multiply(cell);
@@ -350,9 +348,9 @@ bool SPECULATION::succeeds() {
 
 } // namespace
 
-bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop) {
+bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop, SQUARES& squares) {
     if (print_debug)
         debug_printf(
             "\n\n\t\t\t---------- ENTERING 'SPECULATIVELY_ROTATE_LOOP_FOR_ACCUMULATORS' ----------\n");
-    return SPECULATION(loop).succeeds();
+    return SPECULATION(loop, squares).succeeds();
 }

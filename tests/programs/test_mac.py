@@ -61,12 +61,47 @@ REFUSED = {  # what a loop does beside, or in place of, what the hardware does
     "long acc = 0; for (i = 0; i < n; i++) acc += (long)((long long)z[i] * w[i] >> 39);": "a shift too far",
     "unsigned long acc = 0; for (i = 0; i < n; i++) acc += (unsigned long)u[i] * u[i + 1];": "unsigned",
     "long acc = 0; for (i = 0; i < n && acc < 100000; i++) acc += (long)h[i] * k[i];": "tested",
-    "long acc = 0; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; w[i] = acc; }": "stored",
+    "long acc = 0; int* p = h; for (i = 0; i < n; i++) { acc += (long)p[i] * k[i]; p[i + 1] = (int)acc; }": "changes a factor",
+    "long acc = 0; i = 0; do acc += (long)h[i] * k[i]; while (++i < 9 && acc < 9999);": "tested in a loop of two blocks",
+    "long acc = 0; i = 0; do acc += (long)h[i] * k[i]; while (++i < acc >> 16);": "the test needs the sum",
+    "long acc = 0; i = 0; do { acc += (long)h[i] * k[i]; w[i] = acc; } while (h[i++] < 0 && 1);": "the test reads memory",
+    "long acc = 0; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; w[i] = acc; keep(w); }": "a call",
     "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * k[i] + (long)h[i + 1] * k[i + 2];": "two products",
     "long acc = 0; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; keep(&acc); }": "its address is known",
     "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * (int)acc;": "a factor",
     "long acc = 0; for (i = 0; i < n; i++) acc += h[i] * k[i];": "a product of 16 bits",
     "long long acc = 0; for (i = 0; i < n; i++) acc += (long long)w[i] * v[i];": "64 bits",
+}
+ADD = "mpy_add"
+TAKEN = {  # what programmers write: the loop, and its calls
+    # The sum is used where it is made.
+    "long acc = 5; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; w[i] = acc; }": [ADD],
+    "long acc = 5; for (i = 0; i < 17; i++) { acc -= acc >> 4; acc += (long)h[i] * k[i]; }": [ADD],
+    "long acc = 5; int *p = h, *e = h + n; while (p < e) { acc += (long)*p++ * 3 >> 2; w[7] = acc; }": [ADD],
+    "long acc = 5, b = 0; for (i = n; i != 0; i--) { acc += (long)h[i] * k[64 - i]; b += acc; } acc ^= b;": [ADD],
+    "long acc = 5; i = 2; do { acc -= z[i] * v[i]; w[0] ^= acc; i += 3; } while (i < n);": ["mpy_sub_s32_lo"],
+    "long acc = 5; unsigned j; for (j = 0; j < n; j++) { acc += (long)h[j] * k[j]; w[j] += acc; }": [ADD],
+    "long acc = 5; long j; for (j = n - 1; j >= 0; j--) { acc += (long)((long long)z[j] * w[j] >> 35); v[j] = acc; }": ["mpy_add_s32_hi"],
+    # Limits, and indexes that wrap.
+    "long acc = 5; for (i = 0; i < n; i++) { acc += (long)h[i] * k[i]; if (acc > 99999) acc = 99999; }": [ADD],
+    "long acc = 0; for (i = 0; i < n; i++) { int a = h[i]; if (a > 100) a = 100; if (a < -100) a = -100; acc += (long)a * k[i]; }": [ADD],
+    "long acc = 0; int j = 27; for (i = 0; i < n; i++) { acc += (long)h[i] * k[j]; if (++j == 32) j = 0; }": [ADD],
+    "long acc = 0; int j = 3; for (i = 0; i < n; i++) { acc += (long)h[i] * k[j--]; if (j < 0) j = 31; }": [ADD],
+    "long acc = 0; int j = 3; for (i = 0; i < n; i++) { acc += (long)h[i] * k[j]; j = (j + 1) & 31; }": [ADD],
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)(k[i] > 0 ? k[i] : -k[i]) * h[i];": [ADD],
+    # Factors.
+    "long acc = 0; int* p = h; for (i = 0; i < n; i++) { long a = *p++; acc += a * a; }": ["sqr_add"],
+    "long acc = 0; int s = counts[2]; for (i = 0; i < n; i++) acc += (long)h[i * s] * k[i];": [ADD],
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * -7;": ["mpy_sub"],
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)k[i] * (h[i] + h[2 * n - 1 - i]);": [ADD],
+    "long acc = 0; for (i = 0; i < n; i++) acc += (long)h[i] * i;": [ADD],
+    "long acc = 0, b = 0; for (i = 0; i < n; i++) b += h[i], acc += (long)h[i] * h[i]; acc ^= b;": ["sqr_add"],
+    "long acc = 0; for (i = n - 1; i > 0; i--) { acc += (long)h[i] * k[i]; h[i] = h[i - 1]; }": [ADD],
+    # The sum is in memory.
+    "long acc; for (i = 0; i < n; i++) w[3] += (long)h[i] * k[i]; acc = w[3];": [ADD],
+    "static long s; long acc; for (i = 0; i < n; i++) s += (long)h[i] * k[i]; acc = s;": [ADD],
+    "static struct { int n; long s; } s; long acc; for (i = 0; i < n; i++) s.s += (long)h[i] * k[i]; acc = s.s;": [ADD],
+    "long acc = 0; int j; for (j = 0; j < 8; j++) { w[j] = 0; for (i = 0; i < n; i++) w[j] += (long)h[i] * k[i + j]; acc ^= w[j]; }": [ADD],
 }
 # In a unified memory: the loop, and the call.
 DUAL = {
@@ -146,6 +181,14 @@ class Mac(unittest.TestCase):
         for (body, reason), part in zip(REFUSED.items(), parts):
             with self.subTest(reason=reason, body=body):
                 self.assertEqual(calls_in(part), [])
+
+    def test_forms_of_programs(self):
+        program = self.program_of(TAKEN)
+        for (body, calls), part in zip(TAKEN.items(), program.optimized(self, ["--opt_level=2"])):
+            with self.subTest(body=body):
+                self.assertEqual([call[0] for call in calls_in(part)], calls)
+        for options in (["--opt_level=3", "--debug:disable:simple_rotation"], ["--opt_level=4", "--size_speed_goal=2"]):
+            program.optimized(self, options)
 
     def test_words_of_two_elements(self):
         program = self.program_of(DUAL)

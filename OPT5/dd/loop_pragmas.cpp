@@ -502,6 +502,12 @@ void reinsert_loop_pragmas(struct LOOP* loop) {
 void update_pragmas_for_loop(struct LOOP* loop, int factor) {
     const INT65 f = factor;
     loop->unrollAmount = static_cast<uint16_t>(loop->unrollAmount * factor);
+    // All counts are multiples of the factor, but perhaps not their bounds.
+    for (NODE* LOOP::*field : {&LOOP::trips, &LOOP::tripFactor, &LOOP::maxTrips, &LOOP::minTrips})
+        if (is_icon(loop->*field))
+            set_icon(&(loop->*field), (loop->*field)->u.lval / f);
+        else
+            erase_field(&(loop->*field));
     if (NODE* p = loop->unrollPragma) {
         const INT65 left = get_PPRAGMA_tree_int_arg(p, 0) / f;
         if (left == INT65(1) && p->pragma->args.size() >= 2) {

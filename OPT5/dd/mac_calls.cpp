@@ -174,7 +174,8 @@ std::string why_no_mac(const NODE* statement) {
     std::string why = why_no_accumulator(t->left);
     if (why.empty() && !is_mac(t)) {
         why = why_no_product(multiplication_in(t->right));
-        if (t->op == PLUSASG && sym_appears_in_tree(t->left->u.sym, t->right)) why = "what is added uses the sum itself";
+        if (t->op == PLUSASG && sym_appears_in_tree(t->left->u.sym, t->right))
+            why = "what is added uses the sum itself";
     }
     erase_tree(t);
     return why;
@@ -414,8 +415,9 @@ bool read_variable_step(const NODE* t, VARIABLE_STEP* step) {
     if (t->op == ASG && sum->op != PLUS && sum->op != MINUS) return false;
     if (sum->left->op != NAME || sum->left->u.sym != t->left->u.sym || sum->right->op != ICON) return false;
     TYPE* type = t->left->type;
-    const bool is_in_its_type = type->is_pointer() || (t->op == ASG ? equiv_mtypes(sum->type, type)
-                                                                    : compound_ASG_computes_in(type, t->op, t->left, t->right));
+    const bool is_in_its_type =
+        type->is_pointer() ||
+        (t->op == ASG ? equiv_mtypes(sum->type, type) : compound_ASG_computes_in(type, t->op, t->left, t->right));
     if (!is_in_its_type) return false;
     const bool subtracts = sum->op == MINUS || sum->op == MINUSASG;
     step->sym = t->left->u.sym;

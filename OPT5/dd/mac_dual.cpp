@@ -61,6 +61,7 @@ private:
     const NODE* only_mac(std::vector<STEP>& steps) const;
     LIST* two_iterations(const NODE* mac, const std::vector<STEP>& steps, SYMTAB* temp) const;
     void use(LIST* list);
+    void add_behind(NODE* acc, SYMTAB* temp);
     void tell();
     std::string why_not(const NODE* mac);
 
@@ -119,11 +120,28 @@ std::vector<const SYMTAB*> words_in(const BBLK* bb) {
     return words;
 }
 
+// Whether all that the statements do with the accumulator is to add what does not depend on it.
+bool is_only_added_to(const LIST* statements, const SYMTAB* acc) {
+    for (const LIST* s = statements; s; s = s->rest) {
+        const NODE* t = s->first;
+        const bool adds = (t->op == PLUSASG || t->op == MINUSASG) && t->left->op == NAME && t->left->u.sym == acc;
+        if (sym_appears_in_tree(acc, adds ? t->right : t)) return false;
+    }
+    return true;
+}
+
+// The second accumulator begins with zero, and comes to the first one behind the loop.
+void DUAL_LOOP::add_behind(NODE* acc, SYMTAB* temp) {
+    insert_at_end_of_body(loop->preheader, mk_ASG(mk_NAME(temp), mk_ICON(INT65(0), temp->type)));
+    if (exit->predecessors->rest) exit = split_cfg_edge(bb, exit);
+    insert_before(&exit->statements, maketree(PLUSASG, acc, mk_NAME(temp), temp->type), bb->statements->psn);
+}
+
 // Two accumulations of the program itself.
 bool DUAL_LOOP::convert_pair() {
     const std::vector<const SYMTAB*> words = words_in(bb);
-    auto moves_otherwise = [&](const NODE* n) {
-        return n->op == NAME && !sym_is_RC_in_loop(n->u.sym, loop) &&
+    auto moves_otherwise = [&](const NODE* n) { // an array stays where it is, whatever is stored in it
+        return n->op == NAME && !n->type->is_array() && !sym_is_RC_in_loop(n->u.sym, loop) &&
                std::find(words.begin(), words.end(), n->u.sym) == words.end();
     };
     // The second one's accesses are those behind these.
@@ -133,14 +151,31 @@ bool DUAL_LOOP::convert_pair() {
     auto is_misaligned = [&](const NODE* n) { return n->op == UMULT && !is_aligned(n); };
     LIST* copy = copy_dd_statements(bb->statements);
     for (LIST* s = copy; s->rest; s = s->rest) split_accumulations_in_stmt(s);
+    SYMTAB *sum = nullptr, *temp = nullptr; // which takes every second product of the one sum
+    bool any = false;
     for (LIST* s = copy; s->rest && s->rest->rest; s = s->rest) {
-        if (!is_mac(s->first) || any_subtree(s->first, is_misaligned)) continue;
-        if (!conversion_to_s32xs32_DMAC_succeeds(s)) continue;
-        use(copy);
-        return true;
+        if (!is_mac(s->first) || !is_mac(s->rest->first) || any_subtree(s->first, is_misaligned)) continue;
+        NODE* second = s->rest->first->left;
+        SYMTAB* acc = second->u.sym;
+        const bool shares = s->first->left->u.sym == acc;
+        if (shares) {
+            if (sum ? sum != acc : !is_only_added_to(copy, acc)) continue;
+            if (!temp) temp = sym_temp('T', -1, acc->type->stqs(), nullptr);
+            second->u.sym = temp;
+        }
+        if (conversion_to_s32xs32_DMAC_succeeds(s)) {
+            if (shares) sum = acc;
+            any = true;
+        } else if (shares)
+            second->u.sym = acc;
     }
-    erase_tree_list(copy);
-    return false;
+    if (!any) {
+        erase_tree_list(copy);
+        return false;
+    }
+    use(copy);
+    if (sum) add_behind(mk_NAME(sum), temp);
+    return true;
 }
 
 // ---- Two iterations in one
@@ -185,11 +220,17 @@ NODE* mac_of_iteration(const NODE* mac, int iteration, const std::vector<STEP>& 
     return t;
 }
 
+void show(const char* title, const LIST* list) {
+    debug_printf("%s", title);
+    for (; list; list = list->rest) debug_printf("    %s\n", stmt2infix(list->first).c_str());
+}
+
 // The call for both, and all steps behind it. Null where the accumulations are not what the hardware takes.
 LIST* DUAL_LOOP::two_iterations(const NODE* mac, const std::vector<STEP>& steps, SYMTAB* temp) const {
     PSN* psn = bb->statements->psn;
     LIST* test = copy_dd_statements(bb->last_statement());
     LIST* list = mkelist(mac_of_iteration(mac, 0, steps), mkelist(mac_of_iteration(mac, 1, steps), test, psn), psn);
+    if (print_debug) show("[duplicated]\n", list);
     NODE* second = list->rest->first;
     second->left = subst_sym_for_sym_in_tree(second->left->u.sym, temp, second->left);
     if (!conversion_to_s32xs32_DMAC_succeeds(list)) {
@@ -198,6 +239,7 @@ LIST* DUAL_LOOP::two_iterations(const NODE* mac, const std::vector<STEP>& steps,
     }
     LIST* at = list;
     for (const STEP& step : steps) at = insert_behind(at, mk_ASG(mk_NAME(step.sym), sum_of(step, INT65(2))), psn);
+    if (print_debug) show("[delayed]\n", list);
     return list;
 }
 
@@ -208,17 +250,14 @@ bool DUAL_LOOP::convert_doubled() {
     const NODE* mac = only_mac(steps);
     if (loop->has(LOOP_early_exit) || !mac || !all_are_aligned(mac)) return false;
     SYMTAB* temp = sym_temp('T', -1, mac->left->type->stqs(), nullptr);
-    NODE* add = maketree(PLUSASG, copy_tree(mac->left), mk_NAME(temp), mac->left->type->stqs());
-    PSN* psn = bb->statements->psn;
+    NODE* acc = copy_tree(mac->left);
     LIST* list = two_iterations(mac, steps, temp);
     if (!list) {
-        erase_tree(add);
+        erase_tree(acc);
         return false;
     }
     use(list);
-    insert_at_end_of_body(loop->preheader, mk_ASG(mk_NAME(temp), mk_ICON(INT65(0), temp->type)));
-    if (exit->predecessors->rest) exit = split_cfg_edge(bb, exit);
-    insert_before(&exit->statements, add, psn);
+    add_behind(acc, temp);
     update_pragmas_for_loop(loop, 2);
     return true;
 }

@@ -3,8 +3,8 @@
 //     do w[j] += x * y; while (...);          s = w[j]; do s += x * y; while (...); w[j] = s;
 //
 // Needs: alias marks. Leaves: the graph, but for edges that it splits.
-// Sound because the block runs at least once where it is entered, is left at its end alone, and nothing else in it reads or
-// writes the place, whose address stays.
+// Sound because the block runs at least once where it is entered, is left at its end alone, and nothing else in it
+// reads or writes the place, whose address stays.
 #include "OPT5/dd/mac.h"
 
 #include "OPT5/dd/dd.h"
@@ -36,7 +36,8 @@ bool has_plain_address(const NODE* place) {
     auto reads_memory = [](const NODE* t) {
         bool reads = false;
         for_each_subtree(t, [&reads](const NODE* n) {
-            reads |= n->op == UMULT || n->op == STREF || n->op == STDOT || (n->op == NAME && !n->type->is_array() && !is_private_name(n));
+            reads |= n->op == UMULT || n->op == STREF || n->op == STDOT ||
+                     (n->op == NAME && !n->type->is_array() && !is_private_name(n));
         });
         return reads;
     };
@@ -45,7 +46,8 @@ bool has_plain_address(const NODE* place) {
 
 // acc = acc + m of a place.
 bool is_spelled_out(const NODE* t) {
-    return t->op == ASG && (t->right->op == PLUS || t->right->op == MINUS) && trees_are_congruent(t->left, t->right->left, false);
+    return t->op == ASG && (t->right->op == PLUS || t->right->op == MINUS) &&
+           trees_are_congruent(t->left, t->right->left, false);
 }
 
 } // namespace

@@ -11,10 +11,10 @@
 // where the two statements at the start of the loop are one call of the hardware.
 //
 // Needs: alias marks. Leaves: where it succeeds, what the new blocks allow.
-// Sound because what stands up to the multiplication, and what stands behind it, run in turn and as often as before. Only
-// the test moves, to behind the multiplication: it is known ahead, as it reads nothing but variables that stay, or that
-// the rest of the iteration moves by a constant. So nothing is read for an iteration that does not come, and each value
-// that the test computes it computed before. In the loop the multiplication goes back over statements that are
+// Sound because what stands up to the multiplication, and what stands behind it, run in turn and as often as before.
+// Only the test moves, to behind the multiplication: it is known ahead, as it reads nothing but variables that stay, or
+// that the rest of the iteration moves by a constant. So nothing is read for an iteration that does not come, and each
+// value that the test computes it computed before. In the loop the multiplication goes back over statements that are
 // independent of it, none of which may leave the loop.
 #include "OPT5/dd/mac.h"
 
@@ -129,7 +129,7 @@ private:
     LIST* rest = nullptr;     // begins with the accumulation; without the test
     LIST* kernel = nullptr;
     SYMTAB* temp = nullptr;
-    NODE* test = nullptr;     // of the iteration whose prologue is through
+    NODE* test = nullptr; // of the iteration whose prologue is through
 };
 
 bool SPECULATION::may_be_cut() const {
@@ -231,12 +231,13 @@ bool moves_to_limit(const NODE* condition, bool x_is_left, bool continues, const
     return stays_below == (INT65(0) < step.c);
 }
 
-// The test of a variable against a limit that stays, `x + c < n`, as one of x against n - c, which is found ahead of the
-// loop: it is between x and n there. Null if the test is another one.
+// The test of a variable against a limit that stays, `x + c < n`, as one of x against n - c, which is found ahead of
+// the loop: it is between x and n there. Null if the test is another one.
 NODE* SPECULATION::test_of_earlier_limit(BBLK* entry) const {
     const NODE *control = loop.block->branch(), *condition = control->left;
     for (bool x_is_left : {true, false}) {
-        const NODE *x = x_is_left ? condition->left : condition->right, *limit = x_is_left ? condition->right : condition->left;
+        const NODE *x = x_is_left ? condition->left : condition->right,
+                   *limit = x_is_left ? condition->right : condition->left;
         VARIABLE_STEP step;
         int count = 0;
         if (!x || !limit || x->op != NAME || (limit->op != NAME && limit->op != ICON)) continue;
@@ -245,7 +246,8 @@ NODE* SPECULATION::test_of_earlier_limit(BBLK* entry) const {
         const bool continues = control->right->left->lbl->bblock == loop.block;
         if (!stays || !moves_to_limit(condition, x_is_left, continues, step)) continue;
         TYPE* type = limit->type->stqs();
-        NODE* earlier = maketree(MINUS, copy_tree(limit), mk_ICON(step.c, type->is_pointer() ? tp->long_t : type), type);
+        NODE* earlier =
+            maketree(MINUS, copy_tree(limit), mk_ICON(step.c, type->is_pointer() ? tp->long_t : type), type);
         earlier = simp_tree(earlier, nullptr);
         if (earlier->op != ICON) {
             SYMTAB* sym = sym_temp('T', -1, type, nullptr);
@@ -275,7 +277,8 @@ void take_iteration(NODE* pragma) {
     if (pragma->pragma->kind == PRG_MUST_ITERATE) {
         const ITERATE_PROMISE p = promise_of_MUST_ITERATE(pragma);
         const INT65 max = p.max == no_trip_bound() ? p.max : less(p.max);
-        set_PPRAGMA_tree_info(pragma, PRG_MUST_ITERATE, {std::to_string(less(p.min).value), std::to_string(max.value), "1"});
+        set_PPRAGMA_tree_info(pragma, PRG_MUST_ITERATE,
+                              {std::to_string(less(p.min).value), std::to_string(max.value), "1"});
     } else if (pragma->pragma->kind == PRG_PROB_ITERATE)
         for (int n : {0, 1})
             if (!get_PPRAGMA_tree_arg(pragma, n).empty())
@@ -350,7 +353,6 @@ bool SPECULATION::succeeds() {
 
 bool speculatively_rotate_loop_for_accumulators(const MAC_LOOP& loop, SQUARES& squares) {
     if (print_debug)
-        debug_printf(
-            "\n\n\t\t\t---------- ENTERING 'SPECULATIVELY_ROTATE_LOOP_FOR_ACCUMULATORS' ----------\n");
+        debug_printf("\n\n\t\t\t---------- ENTERING 'SPECULATIVELY_ROTATE_LOOP_FOR_ACCUMULATORS' ----------\n");
     return SPECULATION(loop, squares).succeeds();
 }

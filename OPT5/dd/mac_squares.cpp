@@ -1,7 +1,7 @@
 // Squares of what a variable holds become squares of what it was loaded from, where nothing else wants the variable.
 //
-// Needs: alias marks. Leaves: the graph. Sound because the load moves down to the sum over what is independent of it, and is
-// made twice there, of an object that is not volatile; a call of the hardware makes one of both.
+// Needs: alias marks. Leaves: the graph. Sound because the load moves down to the sum over what is independent of it,
+// and is made twice there, of an object that is not volatile; a call of the hardware makes one of both.
 #include "OPT5/dd/mac.h"
 
 #include "OPT5/alias/effects.h"
@@ -81,7 +81,8 @@ void SQUARES::read_from_memory(LIST* statements) {
         if (!is_load_to_square(load->first)) continue;
         for (LIST* sum = load->rest; sum; sum = sum->rest) {
             const NODE* t = sum->first;
-            if ((t->op != PLUSASG && t->op != MINUSASG) || squared_variable(t->right) != load->first->left->u.sym) continue;
+            if ((t->op != PLUSASG && t->op != MINUSASG) || squared_variable(t->right) != load->first->left->u.sym)
+                continue;
             if (read_from_memory(load, sum)) return;
             break;
         }

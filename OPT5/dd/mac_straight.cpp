@@ -5,8 +5,8 @@
 // as a wrapped index or a sum that is limited is written. The hardware's loops have one block.
 //
 // Needs: nothing. Leaves: where it changes a loop, an unsimplified graph.
-// Sound because an arm is one assignment that is cheap and safe where it is not reached, to a variable that is only read
-// then (see scalar/simpcfg.h).
+// Sound because an arm is one assignment that is cheap and safe where it is not reached, to a variable that is only
+// read then (see scalar/simpcfg.h).
 #include "OPT5/dd/mac.h"
 
 #include "OPT5/ir/facts.h"
@@ -36,7 +36,8 @@ BBLK* join_of(const BBLK* bb, size_t* arms) {
     const EDGE* e = bb->successors;
     if (!e || !e->rest || e->rest->rest || !is_choice_of_value(bb)) return nullptr;
     BBLK *a = e->first, *b = e->rest->first;
-    const bool a_is_arm = only(a->predecessors) && only(a->successors), b_is_arm = only(b->predecessors) && only(b->successors);
+    const bool a_is_arm = only(a->predecessors) && only(a->successors),
+               b_is_arm = only(b->predecessors) && only(b->successors);
     *arms = 1;
     if (a_is_arm && only(a->successors) == b) return b;
     if (b_is_arm && only(b->successors) == a) return a;

@@ -1,5 +1,6 @@
-// The multiplier computes one product an iteration: a subscript like `i * stride` takes it from the sum's. Where that is
-// all that stands between a loop and the hardware, the subscript steps instead: k = i * stride; ... i++, k += stride.
+// The multiplier computes one product an iteration: a subscript like `i * stride` takes it from the sum's. Where that
+// is all that stands between a loop and the hardware, the subscript steps instead: k = i * stride; ... i++, k +=
+// stride.
 //
 // Needs: alias marks. Leaves: the graph. Sound because the value has the product's bits at every point of the loop: it
 // steps right behind its variable, in unsigned arithmetic, which wraps.

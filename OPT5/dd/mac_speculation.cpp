@@ -24,6 +24,7 @@
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
@@ -343,7 +344,8 @@ void SPECULATION::drop() {
 }
 
 bool SPECULATION::succeeds() {
-    const bool is_rebuilt = may_be_cut() && cut() && (test = test_ahead()) && make_kernel();
+    const bool is_rebuilt = may_be_cut() && cut() && (test = test_ahead()) && make_kernel() &&
+                            rewrite_is_allowed(loop.block->branch());
     if (is_rebuilt) rebuild();
     drop();
     return is_rebuilt;

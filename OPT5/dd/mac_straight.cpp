@@ -13,6 +13,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/simpcfg.h"
@@ -91,6 +92,7 @@ bool straighten_loops_of_accumulators() {
     for (const auto& loop : currfuninfo->loops->inner_first()) {
         CHAIN chain;
         if (!find_chain(*loop, *currfuninfo->loops, &chain) || !accumulates(chain)) continue;
+        if (!rewrite_is_allowed(loop->header->branch())) continue;
         for (BBLK* bb : chain.choices) any |= choose_value(bb);
     }
     return any;

@@ -228,7 +228,7 @@ long nests(int n, int k) {
 // An address that stays is computed ahead of the loop; the load is not, for the loop stores to what it reads.
 // FUNCTION: settled
 // COUNT 1: PMCONV((long)k
-// HAS: /^s \+= \*\(\$O\$U0 \+ 6\) \* \*\$O\$P1$/
+// HAS: /^s \+= \*\(\$O\$U0 \+ 6\) \* \*\$O\$P\d$/
 void settled(int k, int n, long s) {
     for (int i = 0; i < n; i++) {
         s += m[k][3] * w[i];

@@ -209,7 +209,8 @@ bool tree_changes_nothing(const NODE* tree) {
     });
 }
 
-const void* pure_callee(const NODE* call) {
+const void* computing_callee(const NODE* call, bool* reads_memory) {
+    *reads_memory = false;
     if (!call->type->is_scalar()) return nullptr;
     if (call->op == ICALL) {
         const bool is_pure = ok_to_CSE_ICALL(call) && !any_argument_reaches(call, nullptr, nullptr, false);
@@ -217,7 +218,15 @@ const void* pure_callee(const NODE* call) {
     }
     if (call->op != CALL) return nullptr;
     FUNINFO* f = find_FUNINFO_for_call(call);
-    return f && TEST_FLAG(f, FUN_is_pure_fun) && !TEST_FLAG(f, FUN_never_returns) ? get_callee_for_call(call) : nullptr;
+    if (!f || !TEST_FLAG(f, FUN_is_pure_fun | FUN_only_reads) || TEST_FLAG(f, FUN_never_returns)) return nullptr;
+    *reads_memory = !TEST_FLAG(f, FUN_is_pure_fun);
+    return get_callee_for_call(call);
+}
+
+const void* pure_callee(const NODE* call) {
+    bool reads_memory = false;
+    const void* callee = computing_callee(call, &reads_memory);
+    return reads_memory ? nullptr : callee;
 }
 
 bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
@@ -232,20 +241,31 @@ bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {
                        [lvalue](const NODE* t) { return is_operation_on_memory(t->op) && call_may_read(t, lvalue); });
 }
 
-// What a call in `t` reads is not in the tree: whether `a`, which has side effects, may change it.
-static bool is_read_by_call(const NODE* t) {
-    return any_subtree(t, [](const NODE* call) {
-        if (call->op == ICALL) return any_argument_reaches(call, nullptr, nullptr, false);
+// What a call reads is not in the tree: whether `a` may change it.
+static bool may_change_what_call_reads(const NODE* a, const NODE* call) {
+    bool reads_memory = false;
+    if (!computing_callee(call, &reads_memory)) return tree_has_side_effects(a);
+    bool changes = false;
+    if (reads_memory)
+        for_each_write(a, [&](const WRITE& w) {
+            changes = changes || !w.place || call_may_read(call, access_of_place(w.place));
+        });
+    return changes;
+}
+
+static bool may_change_what_calls_read(const NODE* a, const NODE* t) {
+    return any_subtree(t, [a](const NODE* call) {
+        if (call->op == ICALL) return any_argument_reaches(call, nullptr, nullptr, false) && tree_has_side_effects(a);
         if (!op_is_call(call->op) && call->op != MCALL && call->op != UMCALL && call->op != MEMCPY) return false;
         FUNINFO* f = find_FUNINFO_for_call(call);
-        return !(f && TEST_FLAG(f, FUN_is_pure_fun));
+        return !(f && TEST_FLAG(f, FUN_is_pure_fun)) && may_change_what_call_reads(a, call);
     });
 }
 
 bool tree_modifies_lvalue_in_tree(const NODE* a, const NODE* t) {
     if (tree_contains_op(t, ASM)) return true;
     if (any_lvalue_read(t, [a](const NODE* lvalue) { return tree_modifies_lvalue(a, lvalue); })) return true;
-    return is_read_by_call(t) && tree_has_side_effects(a);
+    return may_change_what_calls_read(a, t);
 }
 
 bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t) {
@@ -305,7 +325,7 @@ bool ACCESS_LISTS::touches(size_t number, const NODE* lvalue) const {
             return any(r.acts, r.reads, [=](const NODE* t) { return node_may_modify(t, part, is_volatile_part); });
         }))
         return true;
-    return tree_contains_op(lvalue, ASM) || (is_read_by_call(lvalue) && tree_has_side_effects(r.tree));
+    return tree_contains_op(lvalue, ASM) || may_change_what_calls_read(r.tree, lvalue);
 }
 
 // ---- What a tree reads

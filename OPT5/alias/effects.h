@@ -85,6 +85,8 @@ bool tree_changes_nothing(const NODE* tree);
 // What a call, a CALL or an ICALL, computes by: the callee's symbol or the built-in's descriptor. Null unless it does
 // nothing but compute a scalar from its arguments, the same each time, if it returns.
 const void* pure_callee(const NODE* call);
+// The same of a callee that may read memory also, as `*reads_memory` tells then.
+const void* computing_callee(const NODE* call, bool* reads_memory);
 
 // ---- Changes
 

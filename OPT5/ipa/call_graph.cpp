@@ -104,7 +104,7 @@ void classify_callees(FUNINFO* f) {
         }
         if (TEST_FLAG(f, FUN_has_1_BB) && !TEST_FLAG(f, FUN_calls_anonymous) && TEST_FLAG(callee, FUN_never_returns)) {
             set_flags(f, FUN_never_returns);
-            clear_flags(f, FUN_is_pure_fun);
+            clear_flags(f, FUN_is_pure_fun | FUN_only_reads);
         }
     }
 }

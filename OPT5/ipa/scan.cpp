@@ -38,6 +38,7 @@ constexpr uint64_t ASSUMPTIONS =
     FUN_no_global_asg | FUN_no_global_use | FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg | FUN_no_ind_use;
 static_assert(ASSUMPTIONS == 0xC30180);
 constexpr uint64_t VOID_IF_REPLACED = 0x32CB0188; // of a function that another definition may take the place of
+constexpr uint64_t PURE = FUN_is_pure_fun | FUN_only_reads;
 constexpr uint32_t FLAG_NO_SIMD = 0x800000;       // of a built-in's descriptor
 
 void count_in(CALLEE** list, FUNINFO* f) {
@@ -71,7 +72,7 @@ public:
         case UMCALL: opaque(t); return;
         case MEMCPY: memory_copy(t); return;
         case ASSERT:
-            clear(FUN_is_pure_fun);
+            clear(PURE);
             operands(t);
             return;
         case NASSERT: assertion(t); return;
@@ -151,21 +152,21 @@ private:
                 f->fl_statics = mk_symlist(sym, f->fl_statics);
         }
         if (!symbol_is_immutable(sym) && (at_file_level || sym->type->is_volatile())) clear(FUN_is_pure_fun);
-        if (sym->type->is_volatile()) clear(FUN_is_pure_fun);
+        if (sym->type->is_volatile()) clear(PURE);
     }
 
     // What an assignment, or a machine operation through an argument, may write.
     void written(const NODE* lvalue) {
         SYMTAB* object = object_name_if_known(object_of_place(lvalue));
         if (!object) {
-            clear(FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg);
+            clear(FUN_no_byref_asg | PURE | FUN_no_ind_asg);
             return;
         }
         if (object->level == 0) {
             object->cqual |= CQ_REFERENCED | CQ_WRITTEN;
-            clear(FUN_no_global_asg | FUN_is_pure_fun);
+            clear(FUN_no_global_asg | PURE);
         }
-        if (object->type->is_volatile() || lvalue->type->is_volatile()) clear(FUN_is_pure_fun);
+        if (object->type->is_volatile() || lvalue->type->is_volatile()) clear(PURE);
     }
 
     void assignment(NODE* t) {
@@ -185,7 +186,7 @@ private:
     }
 
     void indirect_read(NODE* t) {
-        if (t->type->is_volatile()) clear(FUN_is_pure_fun);
+        if (t->type->is_volatile()) clear(PURE);
         if (SYMTAB* object = object_name_if_known(t))
             data_name(object);
         else if (!(t->left->op == NAME && t->left->u.sym->name[0] == '.'))
@@ -196,7 +197,7 @@ private:
 
     void member(NODE* t) {
         if (t->left->op == UMULT) --f->size; // vanishes in addressing
-        if (t->type->is_volatile()) clear(FUN_is_pure_fun);
+        if (t->type->is_volatile()) clear(PURE);
         tree(t->left, false);
     }
 
@@ -230,7 +231,7 @@ private:
             if (NODE* arg = arg_list_lookup(t->left, i); arg->op == ARGREF) written(arg->left);
         const BIF* bif = find_BIF_descriptor(t->u.name);
         if (bif && bif->has(FLAG_NO_SIMD)) f->simd_allowed = false;
-        clear(FUN_is_pure_fun);
+        clear(PURE);
         // An argument that is a pointer leads the operation anywhere.
         note_pointer_arguments(t);
         operands(t);
@@ -245,7 +246,7 @@ private:
         for (int i = 0, n = arg_list_count(t->left); i < n; ++i)
             if (const NODE* arg = arg_list_lookup(t->left, i);
                 arg->type && arg->type->is_pointer() && arg->op != ARGREF)
-                clear(FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg | FUN_no_ind_use | FUN_no_global_asg |
+                clear(FUN_no_byref_asg | PURE | FUN_no_ind_asg | FUN_no_ind_use | FUN_no_global_asg |
                       FUN_no_global_use);
     }
 
@@ -256,13 +257,13 @@ private:
         }
         if (t->op == ASM && t->text) program.assembly.push_back(t->text);
         if (!f->symbol || !(f->symbol->cqual & CQ_INLINE)) set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
-        clear(ASSUMPTIONS);
+        clear(ASSUMPTIONS | FUN_only_reads);
         operands(t);
     }
 
     void memory_copy(NODE* t) {
         add_call_edge(f, make_FUNINFO("memcpy"), true);
-        clear(FUN_no_byref_asg | FUN_is_pure_fun | FUN_no_ind_asg | FUN_no_ind_use);
+        clear(FUN_no_byref_asg | PURE | FUN_no_ind_asg | FUN_no_ind_use);
         // A copy to or from an object by its address is an access of that object.
         for (int i = 0; i < 2; ++i) {
             const NODE* place = place_of_pointer(arg_list_lookup(t->left, i));
@@ -316,8 +317,8 @@ void preprocess_fundef(FUNINFO* f) {
     if (f->bb_count == 1) set_flags(f, FUN_has_1_BB);
 
     const uint64_t remembered = get_flags(f);
-    set_flags(f, ASSUMPTIONS);
-    if (remembered & FUN_never_returns) clear_flags(f, FUN_is_pure_fun);
+    set_flags(f, ASSUMPTIONS | FUN_only_reads);
+    if (remembered & FUN_never_returns) clear_flags(f, PURE);
     f->size = 0;
     f->unique_call_index = 0;
     for (BBLK* bb = f->bb_list; bb; bb = bb->dflink)
@@ -332,7 +333,7 @@ void preprocess_fundef(FUNINFO* f) {
     if (TEST_FLAG(f, FUN_no_ind_asg)) set_flags(f, FUN_no_byref_asg);
     check_fun_for_byref_asgs(f->symbol);
     if (symbol_is_preemptible(f->symbol) || symbol_has_pragma(f->symbol, PRG_WEAK)) {
-        clear_flags(f, VOID_IF_REPLACED);
+        clear_flags(f, VOID_IF_REPLACED | FUN_only_reads);
         set_flags(f, FUN_calls_OUTSIDE | FUN_calls_SYSTEM);
     }
 }
@@ -361,7 +362,7 @@ void add_call_edge(FUNINFO* caller, FUNINFO* callee, bool value_unused) {
     if (!value_unused) set_flags(callee, FUN_value_needed);
     if (TEST_FLAG(caller, FUN_has_1_BB) && TEST_FLAG(callee, FUN_never_returns)) {
         set_flags(caller, FUN_never_returns);
-        clear_flags(caller, FUN_is_pure_fun);
+        clear_flags(caller, PURE);
     }
 }
 
@@ -370,6 +371,7 @@ bool propagate_call_flags(FUNINFO* caller, FUNINFO* callee) {
     const uint64_t before = get_flags(caller), guaranteed = callee ? get_flags(callee) : 0;
     uint64_t broken = ASSUMPTIONS & ~guaranteed;
     if (broken & FUN_no_byref_asg) broken |= FUN_no_ind_asg;
+    if (!(guaranteed & PURE)) broken |= FUN_only_reads;
     clear_flags(caller, broken);
     return get_flags(caller) != before;
 }

@@ -201,9 +201,10 @@ void renumber_labels(const std::vector<NODE*>& branches) {
 void note_endless_function() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         if (!bb->successors) return;
-    if (TEST_FLAG(currfuninfo, FUN_never_returns) || !TEST_FLAG(currfuninfo, FUN_is_pure_fun)) return;
+    constexpr uint64_t COMPUTES = FUN_is_pure_fun | FUN_only_reads;
+    if (TEST_FLAG(currfuninfo, FUN_never_returns) || !TEST_FLAG(currfuninfo, COMPUTES)) return;
     set_flags(currfuninfo, FUN_never_returns);
-    clear_flags(currfuninfo, FUN_is_pure_fun);
+    clear_flags(currfuninfo, COMPUTES);
 }
 
 } // namespace

@@ -63,6 +63,8 @@ enum FUN_FLAG : uint64_t {
     FUN_has_1_BB = 0x20000000,
     FUN_is_main = 0x40000000,
     FUN_is_cpp = 0x80000000,
+    // As a pure one, it only computes, the same each time; but from memory also, which others may change in between.
+    FUN_only_reads = 0x100000000,
 };
 
 struct CALLEE {

@@ -47,6 +47,11 @@ TREE_KEY key_of_FCON(const NODE* t) {
     return {FCON, type_code(t->type), high, m[4] << 16 | m[5], t->u.fval->exp * 2 + t->u.fval->sign};
 }
 
+bool is_computing_call(const NODE* t) {
+    bool reads_memory = false;
+    return computing_callee(t, &reads_memory) != nullptr;
+}
+
 bool op_is_computed(int op) {
     if (op == EXCLAIM || op == SCONV || op == PCONV || op == PMCONV) return true;
     return op_is_arithmetic(op) || op_is_int_compare(op) || op_is_float_compare(op);
@@ -185,7 +190,8 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
-    const void* callee = pure_callee(t);
+    bool reads_memory = false;
+    const void* callee = computing_callee(t, &reads_memory);
     if (!callee || !type_code(t->type)) return {};
     KNOWN k;
     k.cost = weight_of_operator(t);
@@ -242,6 +248,7 @@ TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
     for_each_subtree(tree, [&t](const NODE* n) {
         if (n->op == DIV || n->op == MOD || n->op == CALL || n->op == ICALL) t.may_trap = true;
         if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
+        if (n->op == CALL && !pure_callee(n)) t.reads_memory = true;
         if (n->op != NAME || !n->u.sym || n->u.sym->is_function()) return;
         if (!only_its_name_reaches(n->u.sym)) // an address of it costs nothing to ask about
             t.reads_memory = true;
@@ -299,7 +306,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
     case SWITCH: return read_operands(t->left, true);
     case CALL: return read_operands(t, true);
     default:
-        if ((t->right->op == CALL && !pure_callee(t->right)) || t->op == STASG)
+        if ((t->right->op == CALL && !is_computing_call(t->right)) || t->op == STASG)
             read_operands(t->right, true);
         else
             read(t->right, true);

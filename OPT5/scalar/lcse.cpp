@@ -52,10 +52,10 @@ bool is_assignment_of_private_name(const NODE* t) {
 
 // ---- The numbers of a chain
 
-// A load whose place has not changed since.
+// A load whose place has not changed since, or a call of a function that reads memory.
 struct LOAD {
     TREE_KEY key;
-    NODE* lvalue; // a copy
+    NODE* lvalue; // a copy; of the call
     VALUE value;
     uint64_t names; // those that it mentions, by `mark_of`
 };
@@ -133,6 +133,7 @@ private:
     VALUE of_address(const NODE* place);
     VALUE of_call(const NODE* t);
     TREE_KEY key_of_load(const NODE* t);
+    VALUE of_reading(const TREE_KEY& key, const NODE* t);
 
     VALUE computed_as(const TREE_KEY& key) {
         VALUE& v = computed[key];
@@ -209,13 +210,15 @@ VALUE NUMBERS::of_operator(const NODE* t) {
 }
 
 VALUE NUMBERS::of_call(const NODE* t) {
-    const void* callee = pure_callee(t);
+    bool reads_memory = false;
+    const void* callee = computing_callee(t, &reads_memory);
     if (!callee || !type_code(t->type)) return fresh();
     NODE* list = get_arguments_to_call(t);
     VALUE arguments = 0;
     for (int i = 0, n = arg_list_count(list); i < n; ++i)
         arguments = computed_as({COMMA, 0, 0, arguments, of(arg_list_lookup(list, i))});
-    return computed_as({t->op, type_code(t->type), identity(callee), arguments, 0});
+    const TREE_KEY key{t->op, type_code(t->type), identity(callee), arguments, 0};
+    return reads_memory ? of_reading(key, t) : computed_as(key);
 }
 
 VALUE NUMBERS::of_address(const NODE* place) {
@@ -245,7 +248,10 @@ TREE_KEY NUMBERS::key_of_load(const NODE* t) {
 
 VALUE NUMBERS::of_load(const NODE* t) {
     const TREE_KEY key = key_of_load(t);
-    if (!key.code) return fresh();
+    return key.code ? of_reading(key, t) : fresh();
+}
+
+VALUE NUMBERS::of_reading(const TREE_KEY& key, const NODE* t) {
     for (const LOAD& l : loads)
         if (l.key == key) return l.value;
     const VALUE v = fresh();
@@ -363,7 +369,7 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
 }
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
-    return t->op == ASG && is_private_name(t->left) && (t->right->op != CALL || pure_callee(t->right)) &&
+    return t->op == ASG && is_private_name(t->left) && (t->right->op != CALL || is_computing_call(t->right)) &&
            type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->type) &&
            numbers.of(t->right) == numbers.of(t->left);
 }
@@ -381,7 +387,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     }
     VALUE v = 0;
     const bool is_plain = t->op == ASG || t->op == STASG;
-    if ((t->right->op == CALL && !pure_callee(t->right)) || t->op == STASG) {
+    if ((t->right->op == CALL && !is_computing_call(t->right)) || t->op == STASG) {
         read_operands(t->right, true);
         if (t->op == ASG) v = numbers.fresh(); // a call's
     } else {
@@ -506,7 +512,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
     }
     NODE* t = slot;
     if (!good_CSE_tree(t, false) || !type_code(t->type)) return false;
-    if (!op_is_computed(t->op) && !op_is_load(t->op) && t->op != NAME && !pure_callee(t)) return false;
+    if (!op_is_computed(t->op) && !op_is_load(t->op) && t->op != NAME && !is_computing_call(t)) return false;
     const VALUE v = numbers.of(t);
     OCCURRENCES& known = values[v];
     if (SYMTAB* holder = holder_of(known, v, t->type)) {

@@ -34,6 +34,7 @@ struct TREE_KEY_HASH {
 inline uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); }
 
 TREE_KEY key_of_FCON(const NODE* t);  // its bits
+bool is_computing_call(const NODE* t); // of a function that only computes, be it from memory
 bool op_is_computed(int op); // an operator on values whose result they decide
 // What an operator costs beside its operands, a load included; casts, leaves and addresses are free.
 int weight_of_operator(const NODE* t);

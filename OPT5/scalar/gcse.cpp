@@ -55,7 +55,8 @@ enum FACT_BIT : uint8_t {
 };
 
 struct EVENT : MOTION_EVENT {
-    const TRIPLE_SITE* site; // null where the expression changes
+    const TRIPLE_SITE* site;               // null where the expression changes
+    const TRIPLE_RENEWAL* renewal = nullptr; // of a DEF
 };
 
 // What all expressions of a function share.
@@ -68,6 +69,17 @@ struct FUNCTION {
     FREQUENCIES runs;
     int64_t questions_left = 100000; // about writes to memory; beyond them every write is taken to change it
     int64_t blocks_left = 4000000;   // to be reached; beyond them expressions stay where they are
+    std::unordered_set<const NODE*> gone; // nodes of trees that were taken away; membership only
+
+    bool stands(const TRIPLE_SITE& s) const { return gone.count(*s.slot) == 0; }
+    // The first change of the expression in a block ahead of the position, or the last; 0: there is none.
+    int first_change(const TRIPLE& t, int block, bool with_memory);
+    int last_change(const TRIPLE& t, int block, bool with_memory, int before = INT32_MAX);
+
+private:
+    bool changes_it(const TRIPLE_WRITE& w, const TRIPLE& t) {
+        return --questions_left < 0 || tree_modifies_lvalue_in_tree(w.statement, t.tree);
+    }
 };
 
 class EXPRESSION {
@@ -92,16 +104,14 @@ private:
     };
     uint8_t& at(int block) {
         uint8_t& f = function.facts[static_cast<size_t>(block)];
-        if (f == 0) reach(block, first_change(block));
+        if (f == 0) reach(block, function.first_change(t, block, with_memory));
         return f;
     }
     void reach(int block, int change);
-    int first_change(int block);
-    int last_change(int block);
-    bool changes_it(const TRIPLE_WRITE& w);
-
     void find_local_facts();
+    void enter_block(int block, size_t begin, size_t end, const TRIPLE_RENEWAL* renewal);
     void enter_sites(size_t begin, size_t end, CHANGES c);
+    bool renews(const TRIPLE_RENEWAL& r) const;
     bool compute_PAVIN();
     bool is_partially_available();
 
@@ -118,11 +128,7 @@ std::pair<const TRIPLE_WRITE*, const TRIPLE_WRITE*> in_block(const std::vector<T
     return {begin, std::upper_bound(begin, end, block, [](int b, const TRIPLE_WRITE& w) { return b < w.block; })};
 }
 
-bool EXPRESSION::changes_it(const TRIPLE_WRITE& w) {
-    return --function.questions_left < 0 || tree_modifies_lvalue_in_tree(w.statement, t.tree);
-}
-
-int EXPRESSION::first_change(int block) {
+int FUNCTION::first_change(const TRIPLE& t, int block, bool with_memory) {
     int first = 0;
     auto enter = [&first](int position) {
         if (!first || position < first) first = position;
@@ -134,20 +140,21 @@ int EXPRESSION::first_change(int block) {
     if (!with_memory) return first;
     const auto [begin, end] = in_block(writes_of_memory(), block);
     for (const TRIPLE_WRITE* w = begin; w != end && (!first || w->position < first); ++w)
-        if (changes_it(*w)) enter(w->position);
+        if (changes_it(*w, t)) enter(w->position);
     return first;
 }
 
-int EXPRESSION::last_change(int block) {
+int FUNCTION::last_change(const TRIPLE& t, int block, bool with_memory, int before) {
     int last = 0;
     for (const SYMTAB* sym : t.variables) {
         const auto [begin, end] = in_block(writes_of_variable(sym), block);
-        if (begin != end) last = std::max(last, end[-1].position);
+        for (const TRIPLE_WRITE* w = end; w != begin && w[-1].position > last; --w)
+            if (w[-1].position < before) last = w[-1].position;
     }
     if (!with_memory) return last;
     const auto [begin, end] = in_block(writes_of_memory(), block);
     for (const TRIPLE_WRITE* w = end; w != begin && w[-1].position > last; --w)
-        if (changes_it(w[-1])) last = w[-1].position;
+        if (w[-1].position < before && changes_it(w[-1], t)) last = w[-1].position;
     return last;
 }
 
@@ -165,32 +172,63 @@ void EXPRESSION::reach(int block, int change) {
 
 // What is computed between two changes matters to its block alone.
 void EXPRESSION::enter_sites(size_t begin, size_t end, CHANGES c) {
-    const auto block = static_cast<size_t>(t.sites[begin].block);
-    auto enter = [&](const TRIPLE_SITE& s) {
-        events.push_back({{MOTION_EVENT::USE, block, s.position, !s.is_certain}, &s});
-    };
-    size_t i = begin;
-    for (; i < end && (!c.first || t.sites[i].position <= c.first); ++i) enter(t.sites[i]);
+    for (size_t i = begin; i < end; ++i) {
+        const TRIPLE_SITE& s = t.sites[i];
+        if (c.first && s.position > c.first && s.position <= c.last) continue;
+        events.push_back({{MOTION_EVENT::USE, static_cast<size_t>(s.block), s.position, !s.is_certain}, &s});
+        if (s.is_certain && s.position > c.last) at(s.block) |= AVLOC;
+    }
+}
+
+void EXPRESSION::enter_block(int block, size_t begin, size_t end, const TRIPLE_RENEWAL* renewal) {
+    CHANGES c;
+    c.first = function.first_change(t, block, with_memory);
+    if (c.first) c.last = std::max(c.first, function.last_change(t, block, with_memory));
+    reach(block, c.first);
+    size_t ahead = begin;
+    while (ahead < end && (!c.first || t.sites[ahead].position <= c.first)) ++ahead;
+    enter_sites(begin, ahead, c);
     if (!c.first) return;
-    events.push_back({{MOTION_EVENT::KILL, block, c.first}, nullptr});
-    if (c.last != c.first) events.push_back({{MOTION_EVENT::KILL, block, c.last}, nullptr});
-    for (; i < end; ++i)
-        if (t.sites[i].position > c.last) enter(t.sites[i]);
+    const auto b = static_cast<size_t>(block);
+    const bool is_renewed = renewal && renewal->position == c.last && renews(*renewal);
+    if (c.first != c.last) events.push_back({{MOTION_EVENT::KILL, b, c.first}, nullptr});
+    events.push_back({{is_renewed ? MOTION_EVENT::DEF : MOTION_EVENT::KILL, b, c.last}, nullptr, renewal});
+    if (is_renewed) at(block) |= AVLOC;
+    enter_sites(ahead, end, c);
 }
 
 void EXPRESSION::find_local_facts() {
     events.clear();
-    for (size_t i = 0, end; i < t.sites.size(); i = end) {
-        const int block = t.sites[i].block;
-        for (end = i + 1; end < t.sites.size() && t.sites[end].block == block;) ++end;
-        CHANGES c;
-        c.first = first_change(block);
-        if (c.first) c.last = std::max(c.first, last_change(block));
-        reach(block, c.first);
-        enter_sites(i, end, c);
-        for (size_t k = i; k < end; ++k)
-            if (t.sites[k].is_certain && t.sites[k].position > c.last) at(block) |= AVLOC;
+    size_t site = 0, renewal = 0;
+    while (site < t.sites.size() || renewal < t.renewals.size()) {
+        const int of_site = site < t.sites.size() ? t.sites[site].block : INT32_MAX;
+        const int of_renewal = renewal < t.renewals.size() ? t.renewals[renewal].block : INT32_MAX;
+        const int block = std::min(of_site, of_renewal);
+        size_t end = site;
+        while (end < t.sites.size() && t.sites[end].block == block) ++end;
+        for (; renewal < t.renewals.size() && t.renewals[renewal].block == block; ++renewal) {}
+        enter_block(block, site, end, block == of_renewal ? &t.renewals[renewal - 1] : nullptr);
+        site = end;
     }
+}
+
+// The other expression is computed ahead of the assignment in the chain of blocks that each lead to one that is entered from
+// nowhere else, and nothing changes it in between.
+bool EXPRESSION::renews(const TRIPLE_RENEWAL& r) const {
+    constexpr int MOST_BLOCKS = 4;
+    const TRIPLE& other = unique_triples[r.other];
+    const BBLK* bb = r.bb;
+    int before = r.position;
+    for (int n = 0; n < MOST_BLOCKS; ++n, before = INT32_MAX) {
+        const int changed = function.last_change(other, bb->dfn, other.reads_memory, before);
+        const TRIPLE_SITE* last = nullptr;
+        for (const TRIPLE_SITE& s : other.sites)
+            if (s.block == bb->dfn && s.position <= before && s.is_certain && function.stands(s)) last = &s;
+        if (last) return last->position > changed;
+        if (changed || !bb->predecessors || bb->predecessors->rest) return false;
+        bb = bb->predecessors->first;
+    }
+    return false;
 }
 
 // Whether it comes to where it is computed ahead of any change.
@@ -209,6 +247,8 @@ bool EXPRESSION::compute_PAVIN() {
     };
     for (const TRIPLE_SITE& site : t.sites)
         if (at(site.block) & AVLOC) enter_successors(site.bb);
+    for (const TRIPLE_RENEWAL& r : t.renewals)
+        if (at(r.block) & AVLOC) enter_successors(r.bb);
     while (!waiting.empty() && function.blocks_left >= 0) {
         const BBLK* b = waiting.back();
         waiting.pop_back();
@@ -319,8 +359,8 @@ bool BATCH::pays(const EXPRESSION& e) const {
     double gain = 0;
     size_t deleted = 0;
     for (const EVENT& at : e.events) {
-        if (!at.site) continue;
-        const double runs = function.runs.of(at.site->bb);
+        if (at.kind == MOTION_EVENT::KILL) continue;
+        const double runs = function.runs.of(graph.blocks[at.block]);
         deleted += at.is_deleted;
         if (at.is_deleted)
             gain += (at.is_conditional ? cost / 2 : cost) * runs;
@@ -410,7 +450,6 @@ private:
 
     FUNCTION function;
     std::deque<size_t> waiting;           // the triples still to be looked at, a tree ahead of what it consists of
-    std::unordered_set<const NODE*> gone; // nodes of trees that were taken away; membership only
     std::vector<NODE*> taken_away;        // erased at the end: they hold slots of other expressions
     STATEMENTS_AHEAD ahead;
     EDGE_STATEMENTS on_edges;
@@ -422,7 +461,7 @@ private:
 // Sites within what another expression took away are none any more.
 void GLOBAL_CSE::keep_what_stands(TRIPLE& t) {
     t.sites.erase(std::remove_if(t.sites.begin(), t.sites.end(),
-                                 [this](const TRIPLE_SITE& s) { return gone.count(*s.slot) != 0; }),
+                                 [this](const TRIPLE_SITE& s) { return !function.stands(s); }),
                   t.sites.end());
     if (!t.sites.empty()) t.tree = *t.sites.front().slot;
 }
@@ -497,13 +536,19 @@ void GLOBAL_CSE::apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>
         on_edges.add(p.from, p.to, mk_ASG(mk_NAME(temp, nullptr), copy_tree(t.tree)));
     }
     for (const EVENT& at : e.events) {
-        if (!at.site || !(at.is_deleted || at.is_saved)) continue;
+        if (at.kind == MOTION_EVENT::KILL || !(at.is_deleted || at.is_saved)) continue;
+        if (at.renewal) { // it becomes a copy of what the other expression gave, once values are numbered
+            LIST* cell = at.renewal->cell;
+            insert_behind(cell, mk_ASG(mk_NAME(temp, nullptr), copy_tree(t.tree)), cell->psn);
+            if (print_debug) debug_printf("\tTemp added in block %d:\t %s\n", at.renewal->block, temp->name);
+            continue;
+        }
         const TRIPLE_SITE& s = *at.site;
         NODE* value = *s.slot;
         *s.slot = name(value);
         if (at.is_deleted) {
             if (print_debug) debug_printf("\tDeletion in block %d:\t%s\t<==  %s\n", s.block, text.c_str(), temp->name);
-            for_each_subtree(static_cast<const NODE*>(value), [this](const NODE* n) { gone.insert(n); });
+            for_each_subtree(static_cast<const NODE*>(value), [this](const NODE* n) { function.gone.insert(n); });
             taken_away.push_back(value);
             continue;
         }
@@ -548,7 +593,7 @@ std::vector<std::unique_ptr<EXPRESSION>> GLOBAL_CSE::next_batch() {
 // What was decided rests on sites that are none any more, or a tree that it is part of has to wait.
 bool GLOBAL_CSE::must_wait(const EXPRESSION& e, const std::unordered_set<const NODE*>& held_back) const {
     return std::any_of(e.t.sites.begin(), e.t.sites.end(), [&](const TRIPLE_SITE& s) {
-        return gone.count(*s.slot) != 0 || held_back.count(*s.slot) != 0;
+        return !function.stands(s) || held_back.count(*s.slot) != 0;
     });
 }
 

@@ -107,6 +107,8 @@ std::vector<TRIPLE> unique_triples;
 namespace {
 
 constexpr int NO_TRIPLE = -1, MOST_NODES = 64;
+constexpr size_t MOST_RENEWALS = 8; // assignments of a variable that are looked at for each triple
+constexpr double LEAST_COST_TO_RENEW = 2;
 
 std::unordered_map<const SYMTAB*, std::vector<TRIPLE_WRITE>> variable_writes; // looked up, never walked
 std::vector<TRIPLE_WRITE> memory_writes, staying;
@@ -123,6 +125,7 @@ public:
         for (TRIPLE& t : unique_triples)
             std::stable_sort(t.sites.begin(), t.sites.end(),
                              [](const TRIPLE_SITE& a, const TRIPLE_SITE& b) { return a.block < b.block; });
+        find_renewals();
         // The tree of a triple is asked about for all its sites.
         for (const auto& [number, accesses] : loads) share_PT_info(accesses);
     }
@@ -144,14 +147,28 @@ private:
     KNOWN number_of_leaf(const NODE* t);
     KNOWN number_of_call(const NODE* t);
     int number_of_key(const TREE_KEY& key) {
+        if (replaced) {
+            auto at = numbers.find(key);
+            return at == numbers.end() ? NO_TRIPLE : at->second;
+        }
         return numbers.try_emplace(key, static_cast<int>(numbers.size()) + 1).first->second;
     }
+    void find_renewals();
+    void find_renewals_of(TRIPLE& t);
     TRIPLE& triple_of(int number, const NODE* t, double cost);
 
     std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> numbers; // looked up, never walked
     std::unordered_map<int, size_t> triples;                  // by number
     std::unordered_map<const NODE*, KNOWN> known;             // of the trees of one statement
     std::unordered_map<int, std::vector<NODE*>> loads;        // by number; the order of the walk decides nothing
+    struct ASSIGNMENT {
+        TRIPLE_RENEWAL place;
+        int value; // the number of what is assigned
+    };
+    std::unordered_map<const SYMTAB*, std::vector<ASSIGNMENT>> assignments; // looked up, never walked
+    // A variable that counts as its value has the number, and trees without a number get none, while this is set.
+    const SYMTAB* replaced = nullptr;
+    int replaced_by = NO_TRIPLE;
     BBLK* block = nullptr;
     LIST* cell = nullptr;
     int position = 0;
@@ -180,7 +197,9 @@ void ANNOTATOR::enter_writes(const BBLK* bb, const NODE* t, int at) {
 ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {
     KNOWN k;
     const unsigned code = type_code(t->type);
-    if (t->op == NAME && t->u.sym && !t->u.sym->is_function())
+    if (replaced && t->op == NAME && t->u.sym == replaced)
+        k.number = replaced_by;
+    else if (t->op == NAME && t->u.sym && !t->u.sym->is_function())
         k.number = number_of_key({NAME, code, identity(t->u.sym), 0, 0});
     else if (t->op == ICON && code)
         k.number = number_of_key({ICON, code, t->u.lval.value, t->u.lval.sign, 0});
@@ -210,6 +229,7 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::number(const NODE* t) {
+    if (replaced) return find(t);
     auto at = known.find(t);
     return at != known.end() ? at->second : known[t] = find(t);
 }
@@ -235,8 +255,39 @@ ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
     int x = a.number, y = b.number;
     if (t->right && !is_member && commute_inv[t->op] == t->op && y < x) std::swap(x, y);
     k.number = number_of_key({t->op, code, payload, x, y});
-    if (t->op == UMULT || t->op == STREF) loads[k.number].push_back(const_cast<NODE*>(t));
+    if (!replaced && (t->op == UMULT || t->op == STREF)) loads[k.number].push_back(const_cast<NODE*>(t));
     return k;
+}
+
+// x = ... is the whole statement, and the only effect of it.
+bool assigns_variable(const NODE* t) {
+    return t->op == ASG && is_private_name(t->left) && tree_changes_nothing(t->right) &&
+           type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->u.sym->type) == type_code(t->left->type);
+}
+
+void ANNOTATOR::find_renewals_of(TRIPLE& t) {
+    for (const SYMTAB* x : t.variables) {
+        auto at = assignments.find(x);
+        if (at == assignments.end()) continue;
+        for (size_t i = 0; i < std::min(at->second.size(), MOST_RENEWALS); ++i) {
+            replaced = x;
+            replaced_by = at->second[i].value;
+            const KNOWN other = find(t.tree);
+            replaced = nullptr;
+            auto as = other.number == NO_TRIPLE ? triples.end() : triples.find(other.number);
+            if (as == triples.end() || &unique_triples[as->second] == &t) continue;
+            t.renewals.push_back(at->second[i].place);
+            t.renewals.back().other = as->second;
+        }
+    }
+    std::stable_sort(t.renewals.begin(), t.renewals.end(), [](const TRIPLE_RENEWAL& a, const TRIPLE_RENEWAL& b) {
+        return a.block != b.block ? a.block < b.block : a.position < b.position;
+    });
+}
+
+void ANNOTATOR::find_renewals() {
+    for (TRIPLE& t : unique_triples)
+        if (t.cost >= LEAST_COST_TO_RENEW) find_renewals_of(t);
 }
 
 TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
@@ -310,6 +361,11 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
             read_operands(t->right, true);
         else
             read(t->right, true);
+        if (assigns_variable(t)) {
+            const KNOWN value = number(t->right);
+            if (value.number != NO_TRIPLE)
+                assignments[t->left->u.sym].push_back({{bb->dfn, at, s, bb, 0}, value.number});
+        }
         read_place(t->left, true);
     }
 }

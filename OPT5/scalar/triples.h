@@ -61,6 +61,16 @@ struct TRIPLE_SITE {
     bool is_certain; // whenever the statement is evaluated
 };
 
+// An assignment `x = e` of a variable that a triple reads, behind which the triple has the value of another: of the same
+// expression with e in place of x.
+struct TRIPLE_RENEWAL {
+    int block;
+    int position;
+    LIST* cell;
+    BBLK* bb;
+    size_t other; // number of that triple
+};
+
 struct TRIPLE {
     NODE* tree = nullptr; // its first occurrence, borrowed
     double cost = 0;
@@ -68,6 +78,7 @@ struct TRIPLE {
     bool reads_memory = false;
     std::vector<const SYMTAB*> variables; // private ones that it reads
     std::vector<TRIPLE_SITE> sites;       // in the order of blocks and statements
+    std::vector<TRIPLE_RENEWAL> renewals; // likewise
 };
 
 // A place where something is written.

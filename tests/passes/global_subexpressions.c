@@ -143,6 +143,49 @@ int critical_edges(int a, int b, int c) {
 }
 
 
+// The best so far is not asked again, unless what the answer comes from has changed.
+int weight(int x) { return x * x % 11 + cell * x; }
+// FUNCTION: heaviest
+// COUNT 2: _weight(
+// HAS: /U\d+ = \$O\$N\d+$/
+int heaviest(int n) {
+    int i, best = 0;
+    for (i = 1; i < n; i++)
+        if (weight(i) > weight(best)) best = i;
+    return best;
+}
+int heaviest_of_changing(int n, int *p) {
+    int i, best = 0, first = 0, jump = 0;
+    for (i = 1; i < n; i++) {
+        if (weight(i) > weight(best)) { *p = i - 3; best = i; }
+        if (weight(i) > weight(first)) { first = i; *p ^= n; }
+        if (weight(i) > weight(jump)) { i++; jump = i; }
+    }
+    return best + first * 16 + jump * 256;
+}
+
+// An operator that gets the address of a variable, and assembly, change it.
+const int taps[8] = {3, 1, 4, 1, 5, 9, 2, 6};
+long accumulated(const int *x, int k, int c) {
+    long sum = k, before = sum * 7, now, after;
+    int i;
+    if (c) use((int)before);
+    for (i = 0; i < 8; i++) sum += (long)taps[i] * x[i];
+    now = sum * 7;
+    if (c > 1) use((int)now);
+    for (i = 0; i < 8; i++) sum += (long)taps[i] * x[7 - i];
+    after = sum * 7;
+    return before ^ now ^ after;
+}
+// FUNCTION: assembled
+// COUNT 2: * 21
+int assembled(int c) {
+    int x = cell * 21;
+    if (c) use(x);
+    if (c > 1000) asm("    INC @_cell");
+    return x + cell * 21;
+}
+
 // A loop stays closed by its test: nothing is computed on the edge back.
 // FUNCTION: closed_by_its_test
 // COUNT 1: goto
@@ -169,6 +212,13 @@ int main(void) {
         s.b[1] = c;
         put_i16(calls_on_both_arms(c, 7, c)); put_i16(parts(&bits, &bits, c)); put_i16(reached(c, 5, c));
     }
+    for (c = -3; c < 4; c++) {
+        static const int in[8] = {7, -2, 5, 3, -9, 4, 1, 8};
+        cell = c;
+        put_i16(heaviest(9)); put_i16(heaviest_of_changing(9, &cell)); put_i16(cell);
+        put_i32(accumulated(in, c, c)); put_i16(assembled(c));
+    }
+    cell = 77;
     tab[1] = &cell;
     put_i16(closed_by_its_test(30)); put_i16(cell);
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));

@@ -59,6 +59,7 @@ int operands_change(int a, int b) {
 int cube(int x) { return x * x * x + x / 3; }
 float scaled(float x) { return x * 1.5f + 2.0f; }
 int reads_g(int x) { return x + g; }
+int counts(int x) { static int n; return n++ + x; }
 int samples(void) { return port; }
 // FUNCTION: pure_calls
 // COUNT 1: _cube(
@@ -72,11 +73,18 @@ int pure_calls(int a, int *p) {
 }
 // FUNCTION: other_calls
 // COUNT 2: _samples(
-// COUNT 2: _reads_g(
+// COUNT 3: _reads_g(
+// COUNT 2: _counts(
 int other_calls(int a) {
-    int s = reads_g(a) + samples();
+    int s = samples() + 3, t = reads_g(a) * 5;
+    t += reads_g(a);
+    s -= counts(a);
     g += 1;
-    return s + reads_g(a) - samples();
+    s += samples();
+    s ^= reads_g(a) + t;
+    s -= counts(a);
+    *here = 3;
+    return s + reads_g(a);
 }
 
 // Accesses a constant apart share the sum of base and index.
@@ -128,7 +136,7 @@ int main(void) {
         put_i16(only_on_one_path(c, 6)); put_i16(through_restrict(&g, &h)); put_i16(old_and_new(c, 5));
         tab[c < 0 ? 0 : c].b = c * 70000L; tab[c & 3].a = c; put_i32(neighbours(row + 3, c < 0 ? 1 : c - (c == 4)));
         put_u32(wraps(row, c < 0 ? 65535u : c));
-        put_i16(pure_calls(c, &g)); put_i16(g); put_i16(other_calls(c));
+        put_i16(pure_calls(c, &g)); put_i16(g); here = &g; put_i16(other_calls(c));
         here = &g - 2; put_i16(self(&pp, &pp));
     }
     return 0;

@@ -181,25 +181,7 @@ private:
         if (op == EQ && c == 0) take_zero(left);
         if (op != EQ && op != NEQ && (op >= ULE) != left->type->is_unsigned()) return;
         WIDE k;
-        if (is_term(left, &k)) take_compare(op, c - k);
-    }
-
-    void take_compare(int op, WIDE c) {
-        RANGE r = range;
-        switch (op) {
-        case EQ: r = {std::max(r.min, c), std::min(r.max, c)}; break;
-        case LT:
-        case ULT: r.max = std::min(r.max, c - 1); break;
-        case LE:
-        case ULE: r.max = std::min(r.max, c); break;
-        case GT:
-        case UGT: r.min = std::max(r.min, c + 1); break;
-        case GE:
-        case UGE: r.min = std::max(r.min, c); break;
-        case NEQ: r = {r.min + (r.min == c), r.max - (r.max == c)}; break;
-        default: return;
-        }
-        if (r.min <= r.max) range = r; // otherwise they contradict each other
+        if (is_term(left, &k)) range = narrowed(range, op, {c - k, c - k});
     }
 
     // x % m and x & (2^k - 1) are zero.

@@ -18,6 +18,7 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/implied_tests.h"
 #include "OPT5/simp/simp.h"
+#include "OPT5/simp/symbolic.h"
 
 #include <algorithm>
 
@@ -45,84 +46,9 @@ const NODE* bare_condition(const NODE* t, bool* negated) {
     }
 }
 
-// The integers x for which a compare of x with a constant holds: [low, high], or all but those.
-struct RANGE {
-    const NODE* variable;
-    INT65 low, high;
-    bool outside = false;
-};
-
-std::optional<RANGE> range_of(const NODE* t) {
-    RANGE r;
-    if (t->type && t->op != EQ && !op_is_int_compare(t->op)) {
-        if (!t->type->is_int() || tree_has_side_effects(t)) return std::nullopt;
-        return RANGE{t, INT65(0), INT65(0), true}; // the value itself: any but zero
-    }
-    if (t->right->op != ICON || !t->left->type->is_int()) return std::nullopt;
-    r.variable = t->left;
-    const INT65 c = t->right->u.lval;
-    const bool is_unsigned = t->left->type->is_unsigned();
-    r.low = int_type_min(t->left->type);
-    r.high = int_type_max(t->left->type);
-    if (c < r.low || c > r.high) return std::nullopt;
-    const bool unsigned_op = t->op == ULT || t->op == ULE || t->op == UGE || t->op == UGT;
-    if (t->op != EQ && t->op != NEQ && unsigned_op != is_unsigned) return std::nullopt;
-    switch (t->op) {
-    case EQ: r.low = r.high = c; break;
-    case NEQ:
-        r.low = r.high = c;
-        r.outside = true;
-        break;
-    case LT:
-    case ULT: r.high = c - INT65(1); break;
-    case LE:
-    case ULE: r.high = c; break;
-    case GT:
-    case UGT: r.low = c + INT65(1); break;
-    case GE:
-    case UGE: r.low = c; break;
-    default: return std::nullopt;
-    }
-    return r;
-}
-
-bool is_empty(const RANGE& r) { return r.high < r.low; }
-
-// Whether no value lies in both.
-bool disjoint(const RANGE& a, const RANGE& b) {
-    if (a.outside && b.outside) return false;
-    if (a.outside) return disjoint(b, a);
-    if (is_empty(a)) return true;
-    if (b.outside) return b.low <= a.low && a.high <= b.high;
-    return is_empty(b) || a.high < b.low || b.high < a.low;
-}
-
-// One that touches a limit of the type has an interval as its complement.
-RANGE complement(RANGE r) {
-    const INT65 min = int_type_min(r.variable->type), max = int_type_max(r.variable->type);
-    if (r.outside)
-        r.outside = false;
-    else if (is_empty(r))
-        r.low = min, r.high = max;
-    else if (r.low == min)
-        r.low = r.high + INT65(1), r.high = max;
-    else if (r.high == max)
-        r.high = r.low - INT65(1), r.low = min;
-    else
-        r.outside = true;
-    return r;
-}
-
-std::optional<bool> range_implies(const NODE* p, bool sense, const NODE* q) {
-    std::optional<RANGE> a = range_of(p), b = range_of(q);
-    if (!a || !b || !trees_are_congruent(a->variable, b->variable, false)) return std::nullopt;
-    if (a->variable->type->size != b->variable->type->size ||
-        a->variable->type->is_unsigned() != b->variable->type->is_unsigned())
-        return std::nullopt;
-    if (!sense) a = complement(*a);
-    if (disjoint(*a, *b)) return false;
-    if (disjoint(*a, complement(*b))) return true;
-    return std::nullopt;
+std::optional<bool> implied_by_values(const NODE* p, bool sense, const NODE* q) {
+    const int outcome = outcome_under(p, sense, q, nullptr);
+    return outcome < 0 ? std::nullopt : std::optional<bool>(outcome != 0);
 }
 
 std::optional<bool> implied(const NODE* p, bool sense, const NODE* q);
@@ -154,7 +80,7 @@ std::optional<bool> implied(const NODE* p, bool sense, const NODE* q) {
         known = !sense;
     if (!known) known = implied_by_parts(p, sense, q);
     if (!known) known = implied_parts(p, sense, q);
-    if (!known) known = range_implies(p, sense, q);
+    if (!known) known = implied_by_values(p, sense, q);
     if (!known) return known;
     return *known != q_negated;
 }

@@ -34,6 +34,8 @@ RANGE range_of_type(const TYPE* t);
 // What is left of exact results from `min` to `max` once they are wrapped into the type.
 RANGE wrapped(WIDE min, WIDE max, const TYPE* t);
 RANGE range_of_tree(const NODE* tree, struct LOOP* loop); // of a tree whose type has a range
+// The values from `r.min` to `r.max` that may compare so with one of `c`'s; `r` where none does.
+RANGE narrowed(const RANGE& r, int op, const RANGE& c);
 // Whether an operation over exact operands (PLUS, MINUS, MULT, UMINUS, SLL) stays within its type.
 bool operation_is_exact(const NODE* tree, struct LOOP* loop);
 bool operation_is_exact(int op, const NODE* a, const NODE* b, const TYPE* type, struct LOOP* loop); // b null for UMINUS

@@ -65,6 +65,10 @@ bool tree_is_not_ivalue(const NODE* tree, INT65 value, struct LOOP* loop);
 bool tree_difference_is_ivalue(const NODE* a, const NODE* b, INT65 value, struct LOOP* loop);
 bool tree_values_are_not_equal(const NODE* a, const NODE* b, struct LOOP* loop);
 
+// Of two conditions evaluated on the same values: what `q` is where `p` has the truth value `holds`, by the numbers that
+// this leaves of what they read. 1 true, 0 false, -1 not known.
+int outcome_under(const NODE* p, bool holds, const NODE* q, struct LOOP* loop);
+
 // ---- Factors
 // The largest constant that is known to divide the value: at least 1. A value that is zero for certain gives the
 // highest power of two in its type. With `no_signed_overflow` signed sums and products are taken to be exact, as the

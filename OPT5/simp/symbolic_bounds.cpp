@@ -66,6 +66,24 @@ bool is_same_value(const NODE* a, const NODE* b) {
     return a->op == b->op && trees_are_congruent(a, b, false);
 }
 
+RANGE narrowed(const RANGE& r, int op, const RANGE& c) {
+    switch (op) {
+    case EQ: return both(r, c);
+    case NEQ:
+        if (c.min != c.max || r.min == r.max) return r;
+        return {r.min + (r.min == c.min), r.max - (r.max == c.max)};
+    case LT:
+    case ULT: return both(r, {r.min, c.max - 1});
+    case LE:
+    case ULE: return both(r, {r.min, c.max});
+    case GT:
+    case UGT: return both(r, {c.min + 1, r.max});
+    case GE:
+    case UGE: return both(r, {c.min, r.max});
+    default: return r;
+    }
+}
+
 namespace {
 
 constexpr int MOST_NODES = 64, MOST_BUILTIN_LEVELS = 3, MOST_GIVEN_LEVELS = 2;
@@ -86,25 +104,6 @@ WIDE mask_over(WIDE v) {
     return m;
 }
 
-// The values that `t op c` leaves, if it holds, of those from `r.min` to `r.max`.
-RANGE narrowed(RANGE r, int op, const RANGE& c) {
-    switch (op) {
-    case EQ: return both(r, c);
-    case NEQ:
-        if (c.min != c.max || r.min == r.max) return r;
-        return {r.min + (r.min == c.min), r.max - (r.max == c.max)};
-    case LT:
-    case ULT: return both(r, {r.min, c.max - 1});
-    case LE:
-    case ULE: return both(r, {r.min, c.max});
-    case GT:
-    case UGT: return both(r, {c.min + 1, r.max});
-    case GE:
-    case UGE: return both(r, {c.min, r.max});
-    default: return r;
-    }
-}
-
 // A compare reads its operands as signed or not; the values are theirs only if their type does.
 bool compares_values(const NODE* t) {
     if (!op_is_int_compare(t->op) || !has_value_range(t->left->type) || !has_value_range(t->right->type)) return false;
@@ -112,6 +111,20 @@ bool compares_values(const NODE* t) {
         return false;
     if (wraps_signed(t->left->type) != wraps_signed(t->right->type)) return false;
     return t->op == EQ || t->op == NEQ || (t->op >= ULE) == !wraps_signed(t->left->type);
+}
+
+// 1 always holds, 0 never does, -1 neither.
+int outcome_of_compare(int op, const RANGE& a, const RANGE& b) {
+    switch (op) {
+    case EQ: return a.max < b.min || b.max < a.min ? 0 : a.min == a.max && a == b ? 1 : -1;
+    case LT:
+    case ULT: return a.max < b.min ? 1 : a.min >= b.max ? 0 : -1;
+    case LE:
+    case ULE: return a.max <= b.min ? 1 : a.min > b.max ? 0 : -1;
+    default: break;
+    }
+    const int opposite = outcome_of_compare(boolean_inv[op], a, b);
+    return opposite < 0 ? -1 : !opposite;
 }
 
 class WALK {
@@ -133,6 +146,29 @@ public:
         return r;
     }
 
+    // What `q` is where `p` is known: 1, 0, or -1 for neither.
+    int outcome_under(const NODE* p, bool holds, const NODE* q) {
+        const FACT fact{p, holds, nullptr};
+        facts = &fact;
+        int known = -1;
+        if (compares_values(q)) {
+            known = outcome_of_compare(q->op, of(q->left), of(q->right));
+        } else if (has_value_range(q->type)) {
+            const RANGE r = of(q);
+            known = r.is(0) ? 0 : r.holds(0) ? -1 : 1;
+        }
+        facts = nullptr;
+        HOLE asked;
+        if (known >= 0 || !hole_of(q, true, &asked)) return known;
+        visit_given(p, holds, MOST_FACT_LEVELS, [&](const NODE* fact_of_p, bool is_true) {
+            HOLE given;
+            const bool is_hole = hole_of(fact_of_p, is_true, &given) && given.is_out && given.value == asked.value &&
+                                 is_same_value(given.of, asked.of);
+            if (is_hole) known = asked.is_out;
+        });
+        return known;
+    }
+
 private:
     // The condition of a conditional, while its arm is looked at.
     struct FACT {
@@ -140,6 +176,23 @@ private:
         bool holds;
         const FACT* next;
     };
+
+    // x != c and x == c; x alone is x != 0.
+    struct HOLE {
+        const NODE* of = nullptr;
+        WIDE value = 0;
+        bool is_out = false;
+    };
+    static bool hole_of(const NODE* t, bool holds, HOLE* h) {
+        t = without_wrappers(t);
+        if (!op_is_int_compare(t->op)) {
+            *h = {t, 0, holds};
+            return has_value_range(t->type);
+        }
+        if ((t->op != EQ && t->op != NEQ) || t->right->op != ICON || !compares_values(t)) return false;
+        *h = {t->left, constant(t->right).min, (t->op == NEQ) == holds};
+        return true;
+    }
 
     static RANGE constant(const NODE* t) {
         WIDE v = to_wide(t->u.lval);
@@ -424,6 +477,12 @@ VALUE_WALK value_walk;
 RANGE range_of_tree(const NODE* tree, struct LOOP* loop) {
     const RANGE r = WALK(loop).of(tree);
     return is_plain(tree) || r.min == r.max ? r : both(r, range_of_bits(known_bits(tree), tree->type));
+}
+
+int outcome_under(const NODE* p, bool holds, const NODE* q, struct LOOP* loop) {
+    p = without_wrappers(p);
+    const bool is_number = op_is_int_compare(p->op) || has_value_range(p->type);
+    return is_number && is_small_and_pure(p) && is_small_and_pure(q) ? WALK(loop).outcome_under(p, holds, without_wrappers(q)) : -1;
 }
 
 bool operation_is_exact(const NODE* t, struct LOOP* loop) {

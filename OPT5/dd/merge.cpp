@@ -681,6 +681,37 @@ void MERGE::run() {
 
 } // namespace
 
+// Last addresses that were chosen by whether the loop runs at all: where the values of variables tell, they are settled.
+// Asked once, when all loops have been worked on.
+namespace {
+
+bool is_chosen_limit(const NODE* t) {
+    return t->op == ASG && t->left->op == NAME && t->left->u.sym->is_loop_limit && t->right->op == QUEST;
+}
+
+void settle_limits() {
+    auto has_limit = [](const BBLK* bb) {
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            if (is_chosen_limit(s->first)) return true;
+        return false;
+    };
+    std::vector<BBLK*> ahead;
+    for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (has_limit(bb)) ahead.push_back(bb);
+    if (ahead.empty() || !value_walk.begin) return;
+    value_walk.begin();
+    for (BBLK* bb : ahead)
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            value_walk.at(bb, s->first);
+            if (!is_chosen_limit(s->first)) continue;
+            s->first->right = simp_tree(s->first->right, nullptr);
+            s->first->left->u.sym->is_loop_limit = s->first->right->op == QUEST;
+        }
+    value_walk.end();
+}
+
+} // namespace
+
 void init_skewed_offset_syms() { skewed_offset_syms.clear(); }
 bool is_skewed_offset_sym(const SYMTAB* sym) { return skewed_offset_syms.count(sym) != 0; }
 
@@ -706,4 +737,5 @@ void merge_symbols() {
     hoist_invariants(loops);
     if (loops.has_split_edges()) renumber_bblocks();
     changed(fact::none);
+    settle_limits();
 }

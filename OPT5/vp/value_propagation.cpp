@@ -37,6 +37,8 @@ constexpr size_t MOST_THRESHOLDS = 24; // of a loop
 constexpr int MOST_RETURNS = 12;       // to a head in one pass
 constexpr long BLOCKS_OF_RETURNS = 32; // gone back over in all, for each block of the function
 constexpr size_t MOST_LISTED_CASES = 16;
+constexpr size_t MOST_ORIGINS_BACK = 6; // assignments ahead of a test
+constexpr int MOST_NODES_OF_ORIGIN = 12;
 
 // ---- Which symbols
 
@@ -65,6 +67,14 @@ void find_tracked_symbols() {
     locals.insert(locals.end(), globals.begin(), globals.end());
     init_vpenv_allocation(std::move(locals), first_global);
 }
+
+bool has_same_values(const TYPE* a, const TYPE* b) {
+    return has_value_range(a) && has_value_range(b) && a->size == b->size && wraps_signed(a) == wraps_signed(b) &&
+           !a->is_enum() && !b->is_enum() && a->is_bool() == b->is_bool();
+}
+
+// Quotients are left out: where their dividend is known better they lose the shape in which others are equal to them.
+bool is_part_of_sum(int op) { return op == PLUS || op == MINUS || op == UMINUS || op == SCONV || op == ICON; }
 
 // ---- Widening
 
@@ -174,6 +184,7 @@ struct BLOCK_STATE {
     BBLK* bb = nullptr;
     std::vector<VP_EFFECT> effects; // those that are any, the control statement's among them
     std::vector<size_t> in, out;    // edges
+    std::vector<const NODE*> origins;  // assignments x = e that the control statement tests: x is e there still
     const NODE* may_be_left = nullptr; // the statement ahead of the control statement
     bool heads_loop = false;           // a natural one, which
     std::vector<int> altered;          // changes these, and
@@ -210,6 +221,7 @@ private:
     BLOCK_STATE& at(int number) { return blocks[static_cast<size_t>(number)]; }
     const BLOCK_STATE& at(int number) const { return blocks[static_cast<size_t>(number)]; }
     void read_graph();
+    static void find_origins(BLOCK_STATE* b);
     void find_altered();
     vpenv merged(const BLOCK_STATE& b) const;
     void find_accumulators();
@@ -218,6 +230,7 @@ private:
     void evaluate(BLOCK_STATE& b, int pass);
     bool enter(BLOCK_STATE& b, int pass);
     vpenv capped(const BLOCK_STATE& b, vpenv env) const;
+    static bool filter_origins(const BLOCK_STATE& b, vpenv* env);
     void leave(BLOCK_STATE& b);
     void leave_by(size_t edge, vpenv env, bool can_be);
     void update_amounts(const BLOCK_STATE& b, const VP_EFFECT& effect, vpenv env, int pass);
@@ -244,6 +257,7 @@ void VALUE_SETS::read_graph() {
             VP_EFFECT effect(s->first);
             if (!effect.is_none()) blocks[i].effects.push_back(std::move(effect));
         }
+        find_origins(&blocks[i]);
     }
     for (size_t i = 0; i < order.size(); ++i)
         for (const EDGE* e = order[i]->successors; e; e = e->rest) {
@@ -253,6 +267,31 @@ void VALUE_SETS::read_graph() {
             at(to).closes_cycle |= static_cast<size_t>(to) <= i;
             edges.push_back({static_cast<int>(i), to, {}, false});
         }
+}
+
+// Of the last assignments those of e to x where x is tested, and neither x nor what e reads is written in between.
+void VALUE_SETS::find_origins(BLOCK_STATE* b) {
+    const NODE* control = b->bb->branch();
+    if (!control || (control->op != IF && control->op != SWITCH) || tree_acts(control->left)) return;
+    std::vector<int> written;
+    size_t looked_at = 0;
+    for (size_t i = b->effects.size(); i > 0 && looked_at++ < MOST_ORIGINS_BACK; --i) {
+        const VP_EFFECT& effect = b->effects[i - 1];
+        if (effect.may_lose_globals()) return;
+        written.insert(written.end(), effect.lost_symbols().begin(), effect.lost_symbols().end());
+        const int x = effect.assigned_symbol();
+        if (x < 0) continue;
+        auto stays = [&written](int number) { return number >= 0 && std::find(written.begin(), written.end(), number) == written.end(); };
+        const NODE* t = effect.statement();
+        bool is_origin = t->op == ASG && stays(x) && sym_appears_in_tree(vpenv_store->symbol(x), control->left) &&
+                         has_same_values(t->left->type, t->right->type) && count_nodes_in_tree(t->right) <= MOST_NODES_OF_ORIGIN;
+        written.push_back(x);
+        if (is_origin)
+            for_each_subtree(static_cast<const NODE*>(t->right), [&](const NODE* n) {
+                is_origin &= n->op == NAME ? stays(vpenv_store->number_of(n->u.sym)) : is_part_of_sum(n->op);
+            });
+        if (is_origin) b->origins.push_back(t);
+    }
 }
 
 // What each natural loop changes. Its head dominates it, so that nothing else is changed where a back edge enters.
@@ -427,6 +466,16 @@ void VALUE_SETS::leave_by(size_t edge, vpenv env, bool can_be) {
     at(e.to).is_due = is_changed = true;
 }
 
+// A test of x, which has been assigned e, tells of e too.
+bool VALUE_SETS::filter_origins(const BLOCK_STATE& b, vpenv* env) {
+    for (const NODE* t : b.origins) {
+        const int x = vpenv_store->number_of(t->left->u.sym);
+        const vpset *before = vpenv_store->find(b.exit, x), *now = vpenv_store->find(*env, x);
+        if (now && now != before && !filter_vpenv_by_values(env, t->right, vpset(*now))) return false;
+    }
+    return true;
+}
+
 void VALUE_SETS::leave(BLOCK_STATE& b) {
     const NODE* control = b.bb->branch();
     const bool tests = control && control->op == IF && b.out.size() == 2;
@@ -441,7 +490,7 @@ void VALUE_SETS::leave(BLOCK_STATE& b) {
         for (size_t e : b.out) {
             vpenv env = b.exit;
             const bool can_be = filter_vpenv(&env, control->left, at(edges[e].to).bb == on_true);
-            leave_by(e, env, can_be);
+            leave_by(e, env, can_be && filter_origins(b, &env));
         }
         return;
     }
@@ -454,7 +503,7 @@ void VALUE_SETS::leave(BLOCK_STATE& b) {
             can_be = cases.without_listed(&env, control->left, to);
         else if (const vpset values = cases.of(to); !vpset_is_empty(values))
             can_be = filter_vpenv_by_values(&env, control->left, values);
-        leave_by(e, env, can_be);
+        leave_by(e, env, can_be && filter_origins(b, &env));
     }
 }
 

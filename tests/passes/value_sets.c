@@ -128,6 +128,29 @@ int shapes(int n) {
     return r + (v == 31 ? 9 : v > 30);
 }
 
+// What is tested is a sum of the counter around the loop: the innermost loop runs at least once.
+// FUNCTION: eliminated
+// NOT: ?
+long a[4][4];
+void eliminated(void) {
+    int col, row, k;
+    for (col = 0; col < 4; col++)
+        for (row = col + 1; row < 4; row++) {
+            long f = a[row][col];
+            for (k = col; k < 4; k++) a[row][k] -= f * a[col][k];
+        }
+}
+// FUNCTION: told_by_sums
+// COUNT 0: = 81
+// COUNT 1: = 80
+int told_by_sums(int n, int m) {
+    int v = n + 1, w = m + 1;
+    if (v > 5 && n <= 4) h = 81;
+    m += 2;
+    if (w < 3 && m < -9) h = 80;
+    return h;
+}
+
 // Over all that an int holds.
 static unsigned sum_of_all(int (*f)(int)) {
     unsigned sum = 0;
@@ -154,5 +177,9 @@ int main(void) {
         put_i16(other(i) + cases(i));
     }
     put_i16(nested() + h);
+    for (i = 0; i < 16; i++) a[i >> 2][i & 3] = i * 3 % 7;
+    eliminated();
+    for (i = 0; i < 16; i++) put_i32(a[i >> 2][i & 3]);
+    for (i = -20; i < 20; i++) put_i16(told_by_sums(i, i - 12));
     return 0;
 }

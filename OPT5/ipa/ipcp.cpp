@@ -321,7 +321,7 @@ void SOLVER::link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS&
         if (!a.tree && by_value && has_vpset(passed->type)) {
             init_vpenv_allocation({}, 0);
             a.range = vpset_of_tree(passed, vpenv());
-            erase_all_vpenvs();
+            erase_vpenv();
         }
         if (a.tree)
             for_each_subtree(static_cast<const NODE*>(a.tree), [&](const NODE* t) {
@@ -420,7 +420,7 @@ bool SOLVER::values_of(const ARGUMENT& a, vpset* out) const {
         eval_expr_in_vpenv(out, a.tree, nullptr, env, 0);
         if (print_debug && env != vpenv()) dump_vpenv(env, "VPENV for aarg:\n");
     }
-    erase_all_vpenvs();
+    erase_vpenv();
     return is_ready;
 }
 

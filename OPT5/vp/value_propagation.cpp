@@ -190,6 +190,7 @@ struct BLOCK_STATE {
     std::vector<int> altered;          // changes these, and
     bool alters_globals = false;
     THRESHOLDS thresholds; // of the loop
+    std::vector<std::pair<int, vpset>> courses; // of the induction variables of the loop whose head it is
     std::vector<size_t> capped, updated; // accumulators: of the loop whose head it is; those that it adds to
     bool closes_cycle = false;      // a back edge enters
     bool is_due = false, is_reached = false;
@@ -220,7 +221,7 @@ public:
 private:
     BLOCK_STATE& at(int number) { return blocks[static_cast<size_t>(number)]; }
     const BLOCK_STATE& at(int number) const { return blocks[static_cast<size_t>(number)]; }
-    void read_graph();
+    void read_graph(bool with_loops);
     static void find_origins(BLOCK_STATE* b);
     void find_altered();
     vpenv merged(const BLOCK_STATE& b) const;
@@ -244,7 +245,7 @@ private:
     long returns_left = 0;    // blocks that may be gone back over
 };
 
-void VALUE_SETS::read_graph() {
+void VALUE_SETS::read_graph(bool with_loops) {
     std::vector<BBLK*> order;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) order.push_back(bb);
     std::stable_sort(order.begin(), order.end(), [](const BBLK* a, const BBLK* b) { return a->dfn < b->dfn; });
@@ -254,10 +255,14 @@ void VALUE_SETS::read_graph() {
         number_of[order[i]] = static_cast<int>(i);
         for (const LIST* s = order[i]->statements; s; s = s->rest) {
             if (s->rest) blocks[i].may_be_left = s->first;
-            VP_EFFECT effect(s->first);
+            VP_EFFECT effect(s->first, with_loops ? order[i]->loop : nullptr);
             if (!effect.is_none()) blocks[i].effects.push_back(std::move(effect));
         }
         find_origins(&blocks[i]);
+        if (const struct LOOP* loop = order[i]->loop; with_loops && loop && loop->head == order[i])
+            for (const auto& iv : loop->IVs)
+                if (vpset course; vpenv_store->number_of(iv->sym) >= 0 && find_vpset_in_LOOPIV(&course, iv->sym, loop))
+                    blocks[i].courses.emplace_back(vpenv_store->number_of(iv->sym), course);
     }
     for (size_t i = 0; i < order.size(); ++i)
         for (const EDGE* e = order[i]->successors; e; e = e->rest) {
@@ -443,6 +448,9 @@ bool VALUE_SETS::enter(BLOCK_STATE& b, int pass) {
                 merged = vpenv_store->bind(merged, number, vpset());
         });
     }
+    for (const auto& [number, course] : b.courses)
+        if (vpset s = course; !vpenv_store->find(merged, number) || vpset_intersection(&s, *vpenv_store->find(merged, number), course))
+            merged = vpenv_store->bind(merged, number, s);
     bool is_same = b.is_reached;
     if (is_same)
         vpenv_store->for_each_difference(b.entry, merged, [&](int, const vpset* x, const vpset* y) {
@@ -547,7 +555,7 @@ bool VALUE_SETS::run_pass(int pass) {
 
 bool VALUE_SETS::find(bool with_loops) {
     find_tracked_symbols();
-    read_graph();
+    read_graph(with_loops);
     find_altered();
     if (with_loops) find_accumulators();
     blocks.front().is_due = true;
@@ -572,7 +580,7 @@ void construct_vpsets_for_cfg(int noLoops) {
 
 void deconstruct_vpsets_for_cfg() {
     sets.reset();
-    erase_all_vpenvs();
+    erase_vpenv();
 }
 
 const vpenv* bb_vpenv(const BBLK* bb, bool at_exit) { return sets ? sets->of(bb, at_exit) : nullptr; }

@@ -283,6 +283,15 @@ private:
         }
         vpset s = plain_range(t);
         if (t->op != ANDB || !vpset_is_single(b) || vpset_minimum(b) == 0) return s;
+        // What the members have in common modulo a power of two, the mask's ones at the low end leave.
+        WIDE modulus = 1;
+        while ((vpset_minimum(b) & modulus) && vpset_delta(a) % (modulus * 2) == 0 && modulus < power(62)) modulus *= 2;
+        if (modulus > 1) {
+            const WIDE rest = vpset_minimum(a) & (modulus - 1);
+            vpset congruent;
+            if (vpset_intersection(&congruent, s, vpset(slice_between(vpset_minimum(s), vpset_maximum(s), {rest, rest + modulus, modulus}))))
+                return congruent;
+        }
         WIDE step = 1; // a multiple of the mask's lowest bit
         while ((vpset_minimum(b) & step) == 0) step *= 2;
         vpset multiples;
@@ -495,7 +504,7 @@ bool VALUES_AT::bounds_of_tree(const NODE* tree, INT65* min, INT65* max) const {
 
 vpset vpset_of_tree(const NODE* tree, vpenv env) { return EVALUATION(env).of(tree); }
 
-vpenv eval_expr_in_vpenv(vpset* out, const NODE* tree, struct LOOP*, vpenv env, int assign) {
+vpenv eval_expr_in_vpenv(vpset* out, const NODE* tree, struct LOOP* loop, vpenv env, int assign) {
     if (!tree) {
         make_vpset_empty(out);
         return env;
@@ -504,7 +513,7 @@ vpenv eval_expr_in_vpenv(vpset* out, const NODE* tree, struct LOOP*, vpenv env, 
         *out = vpset_of_tree(tree, env);
         return env;
     }
-    const VP_EFFECT effect(tree);
+    const VP_EFFECT effect(tree, loop);
     *out = vpset_of_tree(tree, effect.during(env));
     return effect.behind(env, false);
 }
@@ -540,7 +549,7 @@ bool assigns_known_value(const NODE* t) {
 
 } // namespace
 
-VP_EFFECT::VP_EFFECT(const NODE* statement) : tree(statement) {
+VP_EFFECT::VP_EFFECT(const NODE* statement, const struct LOOP* loop) : tree(statement) {
     if (tree->op == NASSERT || tree->op == ASSERT) {
         asserted = tree->left;
         if (asserted && asserted->op == COMMA) asserted = asserted->left;
@@ -566,6 +575,7 @@ VP_EFFECT::VP_EFFECT(const NODE* statement) : tree(statement) {
                 target = -1;
                 break;
             }
+    if (target >= 0 && loop) find_vpset_in_LOOPIV(&course, vpenv_store->symbol(target), loop);
 }
 
 vpenv VP_EFFECT::during(vpenv env) const {
@@ -615,6 +625,7 @@ vpenv VP_EFFECT::behind(vpenv env, bool exclusive) const {
     }
     if (tree->op == PCOMMA) return with_parameters(env);
     if (target < 0) return env;
-    const vpset s = value(env);
+    vpset s = value(env);
+    if (vpset inside; !vpset_is_empty(course) && vpset_intersection(&inside, s, course)) s = inside;
     return exclusive ? vpenv_store->bind_exclusively(env, target, s) : vpenv_store->bind(env, target, s);
 }

@@ -20,7 +20,8 @@ bool filter_vpenv_by_values(vpenv* env, const NODE* selector, const vpset& value
 // What a statement does to the environment.
 class VP_EFFECT {
 public:
-    explicit VP_EFFECT(const NODE* statement);
+    // `loop`: that it stands in, if what the hierarchy knows of it counts.
+    explicit VP_EFFECT(const NODE* statement, const struct LOOP* loop = nullptr);
     bool is_none() const { return target < 0 && lost.empty() && !asserted && !loses_globals; }
     // `exclusive`: the environment is changed in place.
     vpenv behind(vpenv env, bool exclusive) const;
@@ -38,9 +39,18 @@ private:
     const NODE* tree;
     const NODE* asserted = nullptr; // a condition that holds from here on
     int target = -1;                // the symbol that the statement's root assigns
+    vpset course;                   // what the target has in the loop; empty: anything
     std::vector<int> lost;          // symbols that are written besides
     bool loses_globals = false;
 };
+
+// ---- vp_loops.cpp
+// What an induction variable of the loop may be at any point of it; false where that is nothing new.
+bool find_vpset_in_LOOPIV(vpset* out, const SYMTAB* sym, const struct LOOP* loop);
+// The predicates of the set, which the symbol has in the loop, which does not change it, as assertions of the outermost
+// loop of which the same holds. How many they are.
+int insert_vpset_binding_in_loop(const vpset& set, SYMTAB* sym, struct LOOP* loop);
+void tell_loop_of_values(struct LOOP* loop, vpenv at_head);
 
 // ---- vp_formals.cpp. Of a parameter that its function only reads, in the parameter's type
 void enter_vpset_of_formal_parm(const class FUNINFO* f, const std::string& parm, const vpset& set);

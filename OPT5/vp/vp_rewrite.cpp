@@ -69,13 +69,15 @@ bool depends_on_bounds(int op) {
 
 class REWRITER {
 public:
-    explicit REWRITER(vpenv in, const SYMTAB* without) : env(in), kept(without), source(&env) {}
+    REWRITER(vpenv in, const SYMTAB* without, struct LOOP* l, const SYM_SET& powers)
+        : env(in), kept(without), loop(l), powers_of_2(powers), source(&env) {}
 
-    NODE* rewritten(NODE* t, bool lvalue) {
+    // `pointerContext`: the tree is an address that is accessed, or a part of one.
+    NODE* rewritten(NODE* t, bool lvalue, bool pointerContext = false) {
         if (!t || is_left_alone(t)) return t;
         const bool outer_informed = informed, outer_changed = changed;
         informed = changed = false;
-        t = t->op == NAME ? name(t, lvalue) : node(t, lvalue);
+        t = t->op == NAME ? name(t, lvalue, pointerContext) : node(t, lvalue, pointerContext);
         any |= changed;
         informed |= outer_informed;
         changed |= outer_changed;
@@ -85,22 +87,26 @@ public:
     bool any = false;
 
 private:
-    NODE* name(NODE* t, bool lvalue) {
+    NODE* name(NODE* t, bool lvalue, bool pointerContext) {
         const int number = lvalue || !t->u.sym ? -1 : vpenv_store->number_of(t->u.sym);
         const vpset* known = number < 0 ? nullptr : vpenv_store->find(env, number);
         if (!known) return t;
         informed = true;
-        if (!vpset_is_single(*known) || !is_integer(t->type) || t->u.sym == kept || t->type->size != t->u.sym->type->size ||
-            is_optimizer_temp(t->u.sym->name, 'K', 'Q') || !rewrite_is_allowed(t))
+        if (!vpset_is_single(*known) || t->u.sym == kept || t->type->size != t->u.sym->type->size ||
+            is_optimizer_temp(t->u.sym->name, 'K', 'Q'))
             return t;
-        NODE* value = mk_ICON(to_int65(vpset_minimum(*known)), t->type->stqs());
+        // Of pointers the null pointer alone is a constant; an access through it stays what it is.
+        const bool is_null = t->type->is_pointer() && known->holds(0) && !pointerContext;
+        if ((!is_integer(t->type) && !is_null) || !rewrite_is_allowed(t)) return t;
+        NODE* value = is_null ? coerce_to_type(t->type->stqs(), mk_ICON(INT65(0), tp->int_t))
+                              : mk_ICON(to_int65(vpset_minimum(*known)), t->type->stqs());
         erase_node(t);
         changed = true;
         return value;
     }
 
-    NODE* node(NODE* t, bool lvalue) {
-        operands(t, lvalue);
+    NODE* node(NODE* t, bool lvalue, bool pointerContext) {
+        operands(t, lvalue, pointerContext || t->op == UMULT || t->op == STREF || (t->type->is_pointer() && t->op != QUEST && !writes_left_operand(t->op)));
         if (lvalue || !informed) return t;
         if (t->op == IF) t->left = decided(t->left);
         if (op_transfers_control(t->op)) return t;
@@ -115,7 +121,7 @@ private:
         return t;
     }
 
-    void operands(NODE* t, bool lvalue) {
+    void operands(NODE* t, bool lvalue, bool pointerContext) {
         switch (t->op) {
         case QUEST:
         case ANDAND:
@@ -128,8 +134,8 @@ private:
             t->left = rewritten(t->left, lvalue);
             return;
         default:
-            t->right = rewritten(t->right, false);
-            t->left = rewritten(t->left, writes_left_operand(t->op));
+            t->right = rewritten(t->right, false, pointerContext);
+            t->left = rewritten(t->left, writes_left_operand(t->op), pointerContext);
         }
     }
 
@@ -178,7 +184,7 @@ private:
             return coerce_to_type(type->stqs(), x);
         }
         if (t->right->op != ICON && t->left->type->size == t->right->type->size &&
-            positive_tree_is_power_of_2(t->right, nullptr)) {
+            ((t->right->op == NAME && powers_of_2.count(t->right->u.sym)) || positive_tree_is_power_of_2(t->right, loop))) {
             changed = true;
             t->op = ANDB;
             TYPE* type = t->right->type->stqs();
@@ -248,6 +254,8 @@ private:
 
     vpenv env;
     const SYMTAB* const kept;
+    struct LOOP* const loop;
+    const SYM_SET& powers_of_2; // known in the block
     VALUES_AT source;
     bool informed = false; // something is known of a part of the tree in work
     bool changed = false;  // a part of it has changed
@@ -256,31 +264,6 @@ private:
 NODE* comparison(int op, SYMTAB* sym, WIDE value) {
     TYPE* type = sym->type->stqs();
     return maketree(op, mk_NAME(sym), mk_ICON(to_int65(value), type), tp->int_t);
-}
-
-constexpr size_t MOST_FACTS = 12; // of values, for one loop
-
-void add_facts(struct LOOP* loop, vpenv env) {
-    size_t left = MOST_FACTS;
-    for (SYMTAB* sym : std::vector<SYMTAB*>(loop->RC_syms.begin(), loop->RC_syms.end())) {
-        const int number = vpenv_store->number_of(sym);
-        const vpset* known = number < 0 ? nullptr : vpenv_store->find(env, number);
-        if (!known || !sym_is_RC_in_loop(sym, loop)) continue;
-        for (NODE* predicate : list_VP_predicate_trees(*known, nullptr, sym))
-            if (left) {
-                --left;
-                add_loop_body_assertion(predicate, loop);
-            } else
-                erase_tree(predicate);
-        if (vpset_is_single(*known) && is_integer(sym->type) && loop->trips && loop->trips->op != ICON) {
-            NODE* name = mk_NAME(sym);
-            loop->trips = simp_subst_icon(to_int65(vpset_minimum(*known)), sym->type->stqs(), name, loop->trips);
-            erase_tree(name);
-        }
-    }
-    if (!loop->trips) return;
-    const VALUES_AT values(&env);
-    characterize_trip_count(loop);
 }
 
 // Where a loop's control variable is tested or updated, or a promise has decided whether a loop is entered, the hierarchy
@@ -293,22 +276,71 @@ const SYMTAB* symbol_kept_in(const NODE* statement, const BBLK* bb) {
 bool is_left_to_hierarchy(const NODE* statement, const BBLK* bb) {
     if (!bb->loop || (statement->op != IF && statement->op != SWITCH)) return false;
     const NODE* test = statement->left;
-    return (test->op == COMMAOP && test->right->op == ICON) ||
-           (!bb->loop->is_root() && (bb == bb->loop->tail || bb == bb->loop->head));
+    if (test->op == COMMAOP && test->right->op == ICON) return true;
+    if (bb->loop->is_root() || bb == bb->loop->tail) return !bb->loop->is_root();
+    bool leaves = false;
+    for (const EDGE* e = bb->successors; e; e = e->rest) leaves |= !loop_is_subloop_of_loop(e->first->loop, bb->loop, true);
+    return bb == bb->loop->head && leaves;
 }
 
-void rewrite_block(BBLK* bb, vpenv env) {
+// ---- Powers of two
+
+// The variables that remainders are taken by.
+SYM_SET find_divisors() {
+    SYM_SET divisors;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            for_each_subtree(static_cast<const NODE*>(s->first), [&](const NODE* t) {
+                if (t->op == MOD && t->right->op == NAME && t->right->u.sym) divisors.insert(t->right->u.sym);
+            });
+    return divisors;
+}
+
+bool gives_power_of_2(const NODE* t, vpenv env, struct LOOP* loop, const SYM_SET& divisors) {
+    if (divisors.empty() || t->op != ASG || t->left->op != NAME || !divisors.count(t->left->u.sym) || t->right->op == ICON ||
+        !is_integer(t->left->type) || vpenv_store->number_of(t->left->u.sym) < 0)
+        return false;
+    const vpset s = vpset_of_tree(t->right, env);
+    const RANGE limits = range_of_type(t->left->type);
+    return !vpset_is_empty(s) && vpset_minimum(s) > 0 && vpset_maximum(s) <= limits.max && positive_tree_is_power_of_2(t->right, loop);
+}
+
+// Behind x = e, for who has x alone: ((x - 1) & x) == 0.
+bool assert_power_of_2(LIST* s) {
+    const NODE* x = s->first->left;
+    TYPE* type = x->type->stqs();
+    NODE* less = maketree(MINUS, copy_tree(x), mk_ICON(INT65(1), type), type);
+    NODE* fact = maketree(NASSERT, maketree(EQ, maketree(ANDB, less, copy_tree(x), type), mk_ICON(INT65(0), type), tp->int_t), nullptr, tp->int_t);
+    if (s->rest && s->rest->first->op == NASSERT && trees_are_congruent(s->rest->first->left, fact->left, false)) {
+        erase_tree(fact);
+        return false;
+    }
+    insert_behind(s, fact, s->psn);
+    currfuninfo->has_nasserts = true;
+    return true;
+}
+
+// Whether it makes assertions.
+bool rewrite_block(BBLK* bb, vpenv env, const SYM_SET& divisors) {
+    SYM_SET powers_of_2; // by the statements so far
+    bool any = false;
     for (LIST* s = bb->statements; s; s = s->rest) {
         NODE* t = s->first;
-        const VP_EFFECT effect(t);
+        const VP_EFFECT effect(t, bb->loop);
         const vpenv behind = effect.behind(env, false);
         if (!tree_is_arg_prolog(t) && !tree_is_EH_SWITCH(t) && !is_left_to_hierarchy(t, bb) && env != vpenv()) {
-            REWRITER work(effect.during(env), symbol_kept_in(t, bb));
+            REWRITER work(effect.during(env), symbol_kept_in(t, bb), bb->loop, powers_of_2);
             s->first = work.rewritten(t, false);
             vp_changed |= work.any;
         }
+        for_each_written_name(s->first, [&](const NODE* name, const NODE*) { powers_of_2.erase(name->u.sym); });
+        if (gives_power_of_2(s->first, env, bb->loop, divisors)) {
+            powers_of_2.insert(s->first->left->u.sym);
+            any |= assert_power_of_2(s);
+        }
         env = behind;
     }
+    return any;
 }
 
 // ---- Assertions for a check
@@ -367,7 +399,8 @@ std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extr
 }
 
 NODE* prop_values_in_tree(NODE* tree, vpenv env, bool lvalue, BBLK* bb) {
-    REWRITER work(env, symbol_kept_in(tree, bb));
+    const SYM_SET none;
+    REWRITER work(env, symbol_kept_in(tree, bb), bb->loop, none);
     NODE* t = work.rewritten(tree, lvalue);
     vp_changed |= work.any;
     return t;
@@ -378,12 +411,17 @@ void do_value_propagation() {
     vp_changed = false;
     struct LOOP* const root = loop_root();
     construct_vpsets_for_cfg(root == nullptr);
+    const SYM_SET divisors = vpenv_store ? find_divisors() : SYM_SET();
+    bool new_assertions = false;
     for (BBLK* bb = currfuninfo->bb_list; bb && vpenv_store; bb = bb->dflink) {
         const vpenv* entry = bb_vpenv(bb, false);
         if (!entry) continue;
         if (print_debug > 1) dump_vpenv(*entry, bb->str());
-        if (root && bb->loop && !bb->loop->is_root() && bb->loop->head == bb) add_facts(bb->loop, *entry);
-        rewrite_block(bb, *entry);
+        if (root && bb->loop && !bb->loop->is_root() && bb->loop->head == bb) {
+            if (new_assertions) find_loop_assertions_for_loop(bb->loop);
+            tell_loop_of_values(bb->loop, *entry);
+        }
+        new_assertions |= rewrite_block(bb, *entry, divisors);
         if (pass_debug_vp_asserts) assert_bindings(bb, *entry);
     }
     deconstruct_vpsets_for_cfg();

@@ -135,7 +135,7 @@ void init_vpenv_allocation(std::vector<SYMTAB*> tracked, size_t first_global) {
     vpenv_store = current_store.get();
 }
 
-void erase_all_vpenvs() {
+void erase_vpenv() {
     vpenv_store = nullptr;
     current_store.reset();
 }

@@ -4,7 +4,7 @@
 // is a handle to a tree over the symbols' numbers, parts of which are shared with other environments and never change:
 // binding one symbol copies one path, and where two environments share a part no walk looks into it. So what a function
 // costs grows with the bindings that change from block to block, not with blocks times symbols. All environments of a
-// function live in one store, from `init_vpenv_allocation` to `erase_all_vpenvs`.
+// function live in one store, from `init_vpenv_allocation` to `erase_vpenv`.
 #pragma once
 
 #include "OPT5/vp/vpset.h"
@@ -95,6 +95,6 @@ private:
 // ---- Of the current function
 extern VPENV_STORE* vpenv_store; // null outside a run
 void init_vpenv_allocation(std::vector<SYMTAB*> tracked, size_t first_global);
-void erase_all_vpenvs();
+void erase_vpenv();
 vpenv assign_vpset_in_vpenv(SYMTAB* sym, const vpset& set, vpenv env); // what is not tracked is left out
 void dump_vpenv(vpenv env, const char* title);

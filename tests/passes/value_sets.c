@@ -1,6 +1,7 @@
 // What values a variable may have decides tests, remainders and choices; what it may not have does not.
 // RUN: --opt_level=2 --disable_inlining
 // LEVELS: 1 3
+#include <intrinsics.h>
 #include <zrun.h>
 
 int x[100], h;
@@ -151,6 +152,58 @@ int told_by_sums(int n, int m) {
     return h;
 }
 
+// How a counter runs, by what it indexes; a step of 2.
+// FUNCTION: by_array
+// NOT: /_h \+= 1?00/
+int by_array(int n) {
+    int i, s = 0;
+    for (i = 0; i < n; i += 2) {
+        s += x[i];
+        if (i > 101) h += 100;
+        if (i & 1) h += 1000;
+    }
+    return s;
+}
+
+// A remainder by a power of two, known where the variable is set alone.
+// FUNCTION: by_power
+// NOT: %
+int by_power(int n, int k) {
+    int i, s = 0, m = 1 << (k & 7);
+    x[7] = m;
+    for (i = 0; i < n; i++) s += (x[i] & 255) % m + (i & 31) % m;
+    return s;
+}
+// FUNCTION: by_other
+// COUNT 1: %
+int by_other(int n, int k) {
+    int m = 1 << (k & 7);
+    x[7] = m;
+    m += k & 1;
+    return (n & 255) % m;
+}
+
+// FUNCTION: null
+// HAS: _at = (int *)0
+int *at;
+int null(int *p) {
+    if (p) return *p;
+    at = p;
+    return h;
+}
+
+// FUNCTION: intrinsics
+// NOT: _h
+int intrinsics(int a, int b) {
+    a = (a & 15) + 3;
+    b = (b & 7) + 2;
+    if (__mpy(a, b) > 162 || __mpy(a, b) < 6 || __mpyu(a, -b) < 3) h += 1;
+    if (__mpyxu(-a, b) > -6 || __mpyxu(-a, b) < -162 || __mpyb(a, b) > 162) h += 2;
+    if (__IQmpy(a, b, 2) > 40 || __qmpy32(a, b, 1) < 3) h += 4;
+    if (__satlow16(a * 32768L) > 32767 || __IQsat(a, 7, 5) < 5) h += 8;
+    return a + b;
+}
+
 // Over all that an int holds.
 static unsigned sum_of_all(int (*f)(int)) {
     unsigned sum = 0;
@@ -178,6 +231,9 @@ int main(void) {
     }
     put_i16(nested() + h);
     for (i = 0; i < 16; i++) a[i >> 2][i & 3] = i * 3 % 7;
+    at = x;
+    put_i16(null(x + 3) + (at == x) + null(0) + (at == 0));
+    for (i = 0; i < 12; i++) put_i16(by_array(i) + by_power(9 * i, i) + by_other(100 * i, i) + intrinsics(i, -i));
     eliminated();
     for (i = 0; i < 16; i++) put_i32(a[i >> 2][i & 3]);
     for (i = -20; i < 20; i++) put_i16(told_by_sums(i, i - 12));

@@ -148,16 +148,19 @@ public:
 
     // What `q` is where `p` is known: 1, 0, or -1 for neither.
     int outcome_under(const NODE* p, bool holds, const NODE* q) {
-        const FACT fact{p, holds, nullptr};
-        facts = &fact;
         int known = -1;
-        if (compares_values(q)) {
-            known = outcome_of_compare(q->op, of(q->left), of(q->right));
-        } else if (has_value_range(q->type)) {
-            const RANGE r = of(q);
-            known = r.is(0) ? 0 : r.holds(0) ? -1 : 1;
+        const bool q_compares = compares_values(q);
+        if (q_compares || has_value_range(q->type)) {
+            const FACT fact{p, holds, nullptr};
+            facts = &fact;
+            if (q_compares)
+                known = outcome_of_compare(q->op, of(q->left), of(q->right));
+            else {
+                const RANGE r = of(q);
+                known = r.is(0) ? 0 : r.holds(0) ? -1 : 1;
+            }
+            facts = nullptr;
         }
-        facts = nullptr;
         HOLE asked;
         if (known >= 0 || !hole_of(q, true, &asked)) return known;
         visit_given(p, holds, MOST_FACT_LEVELS, [&](const NODE* fact_of_p, bool is_true) {
@@ -167,6 +170,14 @@ public:
             if (is_hole) known = asked.is_out;
         });
         return known;
+    }
+
+    // A cast that keeps every value of its operand.
+    static const NODE* without_widening(const NODE* t) {
+        while (t->op == SCONV && has_value_range(t->type) && has_value_range(t->left->type) &&
+               range_of_type(t->left->type).is_within(range_of_type(t->type)))
+            t = without_wrappers(t->left);
+        return t;
     }
 
 private:
@@ -198,14 +209,6 @@ private:
         WIDE v = to_wide(t->u.lval);
         if (t->type->is_bool()) v = v != 0;
         return wrapped(v, v, t->type);
-    }
-
-    // A cast that keeps every value of its operand.
-    static const NODE* without_widening(const NODE* t) {
-        while (t->op == SCONV && has_value_range(t->type) && has_value_range(t->left->type) &&
-               range_of_type(t->left->type).is_within(range_of_type(t->type)))
-            t = without_wrappers(t->left);
-        return t;
     }
 
     RANGE by_fact(RANGE r, const NODE* t, const NODE* fact, bool holds) {
@@ -479,10 +482,30 @@ RANGE range_of_tree(const NODE* tree, struct LOOP* loop) {
     return is_plain(tree) || r.min == r.max ? r : both(r, range_of_bits(known_bits(tree), tree->type));
 }
 
+namespace {
+
+// Without a look at more than the roots of what they compare: whether two conditions may be about one value.
+bool may_meet(const NODE* p, const NODE* q) {
+    auto is_alike = [](const NODE* a, const NODE* b) {
+        a = WALK::without_widening(a);
+        b = WALK::without_widening(b);
+        return a->op == b->op && a->op != ICON && (a->op != NAME || a->u.sym == b->u.sym);
+    };
+    auto has_constant = [](const NODE* t) { return t->left->op == ICON || t->right->op == ICON; };
+    const bool p_compares = op_is_int_compare(p->op), q_compares = op_is_int_compare(q->op);
+    if (!values_of_variables && ((p_compares && !has_constant(p)) || (q_compares && !has_constant(q)))) return false;
+    auto meets = [&](const NODE* a) { return is_alike(a, q_compares ? q->left : q) || (q_compares && is_alike(a, q->right)); };
+    return meets(p_compares ? p->left : p) || (p_compares && meets(p->right));
+}
+
+} // namespace
+
 int outcome_under(const NODE* p, bool holds, const NODE* q, struct LOOP* loop) {
     p = without_wrappers(p);
+    q = without_wrappers(q);
     const bool is_number = op_is_int_compare(p->op) || has_value_range(p->type);
-    return is_number && is_small_and_pure(p) && is_small_and_pure(q) ? WALK(loop).outcome_under(p, holds, without_wrappers(q)) : -1;
+    if (!is_number || !may_meet(p, q) || !is_small_and_pure(p) || !is_small_and_pure(q)) return -1;
+    return WALK(loop).outcome_under(p, holds, q);
 }
 
 bool operation_is_exact(const NODE* t, struct LOOP* loop) {

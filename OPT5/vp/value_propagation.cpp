@@ -259,7 +259,7 @@ void VALUE_SETS::read_graph(bool with_loops) {
             if (!effect.is_none()) blocks[i].effects.push_back(std::move(effect));
         }
         find_origins(&blocks[i]);
-        if (const struct LOOP* loop = order[i]->loop; with_loops && loop && loop->head == order[i])
+        if (const struct LOOP* loop = order[i]->loop; with_loops && loop && loop->head == order[i] && !loop->is_root())
             for (const auto& iv : loop->IVs)
                 if (vpset course; vpenv_store->number_of(iv->sym) >= 0 && find_vpset_in_LOOPIV(&course, iv->sym, loop))
                     blocks[i].courses.emplace_back(vpenv_store->number_of(iv->sym), course);
@@ -288,7 +288,7 @@ void VALUE_SETS::find_origins(BLOCK_STATE* b) {
         if (x < 0) continue;
         auto stays = [&written](int number) { return number >= 0 && std::find(written.begin(), written.end(), number) == written.end(); };
         const NODE* t = effect.statement();
-        bool is_origin = t->op == ASG && stays(x) && sym_appears_in_tree(vpenv_store->symbol(x), control->left) &&
+        bool is_origin = t->op == ASG && (t->right->op == NAME || is_part_of_sum(t->right->op)) && stays(x) && sym_appears_in_tree(vpenv_store->symbol(x), control->left) &&
                          has_same_values(t->left->type, t->right->type) && count_nodes_in_tree(t->right) <= MOST_NODES_OF_ORIGIN;
         written.push_back(x);
         if (is_origin)

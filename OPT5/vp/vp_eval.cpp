@@ -59,6 +59,10 @@ public:
         t = without_wrappers(t);
         if (!has_vpset(t->type)) return {};
         if (--nodes_left < 0 || levels >= MOST_LEVELS) return bottom(t->type);
+        if (t->op == ICON) return of_constant(t);
+        if (t->op == NAME)
+            if (const int number = number_of_name(t); number >= 0)
+                if (const vpset* known = vpenv_store->find(env, number)) return *known;
         ++levels;
         vpset s = evaluated(t);
         --levels;
@@ -135,14 +139,10 @@ private:
     vpset evaluated(const NODE* t) {
         if (boolean_result[t->op]) return of_condition(t);
         switch (t->op) {
-        case ICON: return of_constant(t);
         case NAME: {
-            const int number = number_of_name(t);
-            const vpset* known = number < 0 ? nullptr : vpenv_store->find(env, number);
             vpset passed;
-            if (!known && t->u.sym && t->type->stqs() == t->u.sym->type->stqs() && find_vpset_in_formal_parms(&passed, t->u.sym))
-                return passed;
-            return known ? *known : plain_range(t);
+            const bool is_passed = t->u.sym && t->type->stqs() == t->u.sym->type->stqs() && find_vpset_in_formal_parms(&passed, t->u.sym);
+            return is_passed ? passed : plain_range(t);
         }
         case COMMAOP: return as_type(of(t->right), t->right, t->type);
         case ASG: return t->left->op == NAME ? as_type(of(t->right), t->right, t->type) : plain_range(t);
@@ -575,7 +575,8 @@ VP_EFFECT::VP_EFFECT(const NODE* statement, const struct LOOP* loop) : tree(stat
                 target = -1;
                 break;
             }
-    if (target >= 0 && loop) find_vpset_in_LOOPIV(&course, vpenv_store->symbol(target), loop);
+    if (vpset s; target >= 0 && loop && find_vpset_in_LOOPIV(&s, vpenv_store->symbol(target), loop))
+        course = std::make_unique<vpset>(s);
 }
 
 vpenv VP_EFFECT::during(vpenv env) const {
@@ -626,6 +627,6 @@ vpenv VP_EFFECT::behind(vpenv env, bool exclusive) const {
     if (tree->op == PCOMMA) return with_parameters(env);
     if (target < 0) return env;
     vpset s = value(env);
-    if (vpset inside; !vpset_is_empty(course) && vpset_intersection(&inside, s, course)) s = inside;
+    if (vpset inside; course && vpset_intersection(&inside, s, *course)) s = inside;
     return exclusive ? vpenv_store->bind_exclusively(env, target, s) : vpenv_store->bind(env, target, s);
 }

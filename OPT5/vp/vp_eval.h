@@ -3,6 +3,8 @@
 
 #include "OPT5/vp/vpenv.h"
 
+#include <memory>
+
 struct LOOP;
 
 // What is tracked and evaluated: an integer, enumeration or pointer whose values have a range.
@@ -39,7 +41,7 @@ private:
     const NODE* tree;
     const NODE* asserted = nullptr; // a condition that holds from here on
     int target = -1;                // the symbol that the statement's root assigns
-    vpset course;                   // what the target has in the loop; empty: anything
+    std::unique_ptr<vpset> course;  // what the target has in the loop; null: anything
     std::vector<int> lost;          // symbols that are written besides
     bool loses_globals = false;
 };

@@ -285,24 +285,22 @@ bool is_left_to_hierarchy(const NODE* statement, const BBLK* bb) {
 
 // ---- Powers of two
 
-// The variables that remainders are taken by.
-SYM_SET find_divisors() {
-    SYM_SET divisors;
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            for_each_subtree(static_cast<const NODE*>(s->first), [&](const NODE* t) {
-                if (t->op == MOD && t->right->op == NAME && t->right->u.sym) divisors.insert(t->right->u.sym);
-            });
-    return divisors;
+// Whether a remainder is taken by the variable.
+bool is_divisor(const SYMTAB* sym) {
+    bool divides = false;
+    for (const BBLK* bb = currfuninfo->bb_list; bb && !divides; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s && !divides; s = s->rest)
+            divides = any_subtree(s->first, [sym](const NODE* t) { return t->op == MOD && t->right->op == NAME && t->right->u.sym == sym; });
+    return divides;
 }
 
-bool gives_power_of_2(const NODE* t, vpenv env, struct LOOP* loop, const SYM_SET& divisors) {
-    if (divisors.empty() || t->op != ASG || t->left->op != NAME || !divisors.count(t->left->u.sym) || t->right->op == ICON ||
-        !is_integer(t->left->type) || vpenv_store->number_of(t->left->u.sym) < 0)
+bool gives_power_of_2(const NODE* t, vpenv env, struct LOOP* loop) {
+    if (t->op != ASG || t->left->op != NAME || t->right->op == ICON || !is_integer(t->left->type) ||
+        !positive_tree_is_power_of_2(t->right, loop) || vpenv_store->number_of(t->left->u.sym) < 0)
         return false;
     const vpset s = vpset_of_tree(t->right, env);
     const RANGE limits = range_of_type(t->left->type);
-    return !vpset_is_empty(s) && vpset_minimum(s) > 0 && vpset_maximum(s) <= limits.max && positive_tree_is_power_of_2(t->right, loop);
+    return !vpset_is_empty(s) && vpset_minimum(s) > 0 && vpset_maximum(s) <= limits.max && is_divisor(t->left->u.sym);
 }
 
 // Behind x = e, for who has x alone: ((x - 1) & x) == 0.
@@ -321,7 +319,7 @@ bool assert_power_of_2(LIST* s) {
 }
 
 // Whether it makes assertions.
-bool rewrite_block(BBLK* bb, vpenv env, const SYM_SET& divisors) {
+bool rewrite_block(BBLK* bb, vpenv env) {
     SYM_SET powers_of_2; // by the statements so far
     bool any = false;
     for (LIST* s = bb->statements; s; s = s->rest) {
@@ -333,8 +331,9 @@ bool rewrite_block(BBLK* bb, vpenv env, const SYM_SET& divisors) {
             s->first = work.rewritten(t, false);
             vp_changed |= work.any;
         }
-        for_each_written_name(s->first, [&](const NODE* name, const NODE*) { powers_of_2.erase(name->u.sym); });
-        if (gives_power_of_2(s->first, env, bb->loop, divisors)) {
+        if (!powers_of_2.empty())
+            for_each_written_name(s->first, [&](const NODE* name, const NODE*) { powers_of_2.erase(name->u.sym); });
+        if (gives_power_of_2(s->first, env, bb->loop)) {
             powers_of_2.insert(s->first->left->u.sym);
             any |= assert_power_of_2(s);
         }
@@ -411,7 +410,6 @@ void do_value_propagation() {
     vp_changed = false;
     struct LOOP* const root = loop_root();
     construct_vpsets_for_cfg(root == nullptr);
-    const SYM_SET divisors = vpenv_store ? find_divisors() : SYM_SET();
     bool new_assertions = false;
     for (BBLK* bb = currfuninfo->bb_list; bb && vpenv_store; bb = bb->dflink) {
         const vpenv* entry = bb_vpenv(bb, false);
@@ -421,7 +419,7 @@ void do_value_propagation() {
             if (new_assertions) find_loop_assertions_for_loop(bb->loop);
             tell_loop_of_values(bb->loop, *entry);
         }
-        new_assertions |= rewrite_block(bb, *entry, divisors);
+        new_assertions |= rewrite_block(bb, *entry);
         if (pass_debug_vp_asserts) assert_bindings(bb, *entry);
     }
     deconstruct_vpsets_for_cfg();

@@ -161,6 +161,9 @@ public:
             }
             facts = nullptr;
         }
+        // What never is implies anything.
+        const int op_of_p = holds ? p->op : boolean_inv[p->op];
+        if (known < 0 && compares_values(p) && outcome_of_compare(op_of_p, of(p->left), of(p->right)) == 0) return 0;
         HOLE asked;
         if (known >= 0 || !hole_of(q, true, &asked)) return known;
         visit_given(p, holds, MOST_FACT_LEVELS, [&](const NODE* fact_of_p, bool is_true) {

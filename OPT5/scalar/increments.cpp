@@ -28,6 +28,7 @@
 #include "OPT5/target/bif.h"
 
 #include <algorithm>
+#include <unordered_set>
 #include <vector>
 
 namespace {
@@ -35,6 +36,7 @@ namespace {
 constexpr int MOST_BLOCKS_BACK = 10; // by number, between a step and its reference
 constexpr int MOST_BLOCKS_FORWARD = 5;
 constexpr int MOST_STATEMENTS = 256; // that one step looks at
+constexpr size_t MOST_PARTS = 16;    // references through one pointer in front of its step
 constexpr int MOST_SPLIT_EXITS = 8;  // of loops; each asks for the graph's facts again
 
 // p = p + c, in units of 16 bits.
@@ -130,8 +132,8 @@ private:
         long offset = 0;
         const bool is_plain = address->op == NAME && address->u.sym == step.p;
         if (!is_plain && !is_sum(address, step.p, &offset)) return false;
-        const bool fits = direction == BACKWARD ? (is_plain ? step.c > 0 : offset == step.c)
-                                                : (is_plain ? step.c < 0 : offset == -step.c);
+        const bool fits =
+            direction == BACKWARD ? (is_plain ? step.c > 0 : offset == step.c) : (is_plain || offset == -step.c);
         return fits && has_size_of_step(umult->type);
     }
 
@@ -165,6 +167,8 @@ private:
     USE search_from(BBLK* bb, LIST* cell, const STEP& step, int budget, BBLK** end);
     BBLK* block_behind(const std::vector<BBLK*>& seen, int* budget) const;
     bool moves_around(BBLK* latch, LIST* cell, const STEP& step);
+    bool moves_to_only_use(BBLK* bb, NODE* tree, const STEP& step);
+    bool moves_in_parts(LIST* first, const LIST* cell, const STEP& step);
 
     static void absorb_backward(NODE* umult, NODE* tree, const STEP& step);
     static void absorb_forward(NODE* umult, NODE* tree, const STEP& step);
@@ -265,6 +269,8 @@ bool has_two(const EDGE* list) { return list && list->rest && !list->rest->rest;
 
 // The block from which control comes to this one whatever a branch in between decides, which does not concern p.
 BBLK* INCREMENTS::block_in_front(const BBLK* bb, const SYMTAB* p) {
+    if (BBLK* front = bb->predecessors && !bb->predecessors->rest ? bb->predecessors->first : nullptr)
+        return front->dfn < bb->dfn && only(front->successors) == bb ? front : nullptr;
     if (!has_two(bb->predecessors)) return nullptr;
     BBLK *a = bb->predecessors->first, *b = bb->predecessors->rest->first;
     if (a->dfn > b->dfn) std::swap(a, b);
@@ -294,6 +300,135 @@ bool INCREMENTS::moves_backward(size_t at, BBLK* bb, NODE* tree, const STEP& ste
     }
 }
 
+// ---- To the one reference
+
+bool is_setting(const NODE* t, const SYMTAB* p) {
+    return t->op == ASG && t->left->op == NAME && t->left->u.sym == p && !sym_appears_in_tree(p, t->right);
+}
+
+// What p holds where the loop is left is nobody's business: on each path from there it is set first.
+bool is_dead_behind(const NATURAL_LOOPS& loops, const NATURAL_LOOP* loop, const SYMTAB* p) {
+    std::vector<const BBLK*> waiting;
+    std::unordered_set<const BBLK*> seen; // looked up alone
+    auto add = [&](const BBLK* bb) {
+        if (seen.insert(bb).second) waiting.push_back(bb);
+    };
+    for (const BBLK* bb : loop->blocks)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (!loops.contains(loop, e->first)) add(e->first);
+    while (!waiting.empty()) {
+        const BBLK* bb = waiting.back();
+        waiting.pop_back();
+        bool is_set = false;
+        for (const LIST* s = bb->statements; s && !is_set; s = s->rest) {
+            if (!s->first || !sym_appears_in_tree(p, s->first)) continue;
+            if (!is_setting(s->first, p)) return false;
+            is_set = true;
+        }
+        for (const EDGE* e = is_set ? nullptr : bb->successors; e; e = e->rest) {
+            if (loops.contains(loop, e->first)) return false;
+            add(e->first);
+        }
+    }
+    return true;
+}
+
+// `x = *p` at the start of a loop whose iterations all end in `p += 1`, whatever lies between, if nothing else concerns
+// p.
+bool INCREMENTS::moves_to_only_use(BBLK* bb, NODE* tree, const STEP& step) {
+    if (again) return false;
+    need(fact::loops);
+    const NATURAL_LOOPS& loops = *currfuninfo->loops;
+    const NATURAL_LOOP* loop = loops.around(bb);
+    if (!loop || !loops.dominates_latches(bb, loop)) return false;
+    const SEARCH search(step, BACKWARD);
+    NODE* umult = nullptr;
+    const BBLK* at = nullptr;
+    for (const BBLK* b : loop->blocks)
+        for (const LIST* s = b->statements; s; s = s->rest) {
+            if (s->first == tree) break; // p is stepped behind it in any case
+            const USE use = s->first ? search.of(s->first) : USE{};
+            if (use.kind == USE::BLOCKED || (use.kind == USE::HIT && umult)) return false;
+            if (use.kind == USE::HIT) umult = use.umult, at = b;
+        }
+    if (!umult || umult->left->op != NAME || loops.around(at) != loop || at == bb || !loops.dominates(at, bb))
+        return false;
+    if (!is_dead_behind(loops, loop, step.p) || !rewrite_is_allowed(tree)) return false;
+    absorb_backward(umult, tree, step);
+    return true;
+}
+
+// ---- In parts
+
+// A reference through p, and how often its statement names p.
+struct PART {
+    NODE* umult;
+    const NODE* statement;
+    long offset;
+    bool takes_step;
+};
+
+// All that the statement does with p is to read and write through it, for certain. Adds those references.
+bool list_references(NODE* t, const NODE* statement, const SYMTAB* p, bool is_conditional, std::vector<PART>& found) {
+    if (!t) return true;
+    if (t->op == NAME) return t->u.sym != p;
+    if (t->op == UMULT && !t->right) {
+        long offset = 0;
+        if ((t->left->op == NAME && t->left->u.sym == p) || is_sum(t->left, p, &offset)) {
+            found.push_back({t, statement, offset, false});
+            return !is_conditional;
+        }
+    }
+    if (t->op == UAND || t->op == ASSERT || t->op == NASSERT) return !sym_appears_in_tree(p, t);
+    const bool guards = t->op == ANDAND || t->op == OROR || t->op == QUEST;
+    if (!list_references(t->left, statement, p, is_conditional, found)) return false;
+    return t->op == IF || t->op == SWITCH || list_references(t->right, statement, p, is_conditional || guards, found);
+}
+
+// `x = *p; y = *(p + 1); p += 2` becomes `x = *p++; y = *p++`: references at the offsets that p has been stepped by
+// take a step of their size each, the latest that do. What lies between has p ahead.
+bool INCREMENTS::moves_in_parts(LIST* first, const LIST* cell, const STEP& step) {
+    if (step.c < 2) return false;
+    std::vector<PART> parts;
+    for (LIST* s = first; s != cell; s = s->rest) {
+        const bool may_be_left = tree_is_EH_SWITCH(s->first) || (s->rest && tree_is_EH_SWITCH(s->rest->first));
+        std::vector<PART> own;
+        if (may_be_left || !list_references(s->first, s->first, step.p, false, own)) parts.clear(), own.clear();
+        parts.insert(parts.end(), own.begin(), own.end());
+    }
+    if (parts.empty() || parts.size() > MOST_PARTS) return false;
+    const long size = static_cast<long>(parts.back().umult->type->size / 16);
+    if (size < 1 || step.c % size || step.c == size) return false;
+    long wanted = step.c - size;
+    for (size_t i = parts.size(); i-- > 0 && wanted >= 0;) {
+        PART& part = parts[i];
+        const bool shares = (i > 0 && parts[i - 1].statement == part.statement) ||
+                            (i + 1 < parts.size() && parts[i + 1].statement == part.statement);
+        part.takes_step = !shares && part.offset == wanted && static_cast<long>(part.umult->type->size / 16) == size;
+        if (part.takes_step) wanted -= size;
+    }
+    if (wanted >= 0) return false;
+    // No more sums than before: of references, and of the step.
+    long ahead = 0, sums = -1;
+    for (const PART& part : parts) {
+        sums += (part.offset != ahead || part.takes_step) - (part.offset != 0);
+        if (part.takes_step) ahead += size;
+    }
+    if (sums > 0 || !rewrite_is_allowed(cell->first)) return false;
+    ahead = 0;
+    for (const PART& part : parts) {
+        const long offset = part.offset - ahead;
+        NODE* address = part.takes_step ? post_step({step.p, size}) : mk_NAME(step.p);
+        if (offset) address = maketree(PLUS, address, mk_ICON(INT65(offset), tp->long_t), step.p->type->stqs());
+        if (ahead || part.takes_step)
+            set_address(part.umult, address);
+        else
+            erase_tree(address);
+        if (part.takes_step) ahead += size;
+    }
+    return true;
+}
+
 void INCREMENTS::sweep_backward(BBLK* bb) {
     for (size_t i = cells_of(bb).size(); i-- > 0;) {
         LIST* cell = cells_of(bb)[i];
@@ -301,7 +436,14 @@ void INCREMENTS::sweep_backward(BBLK* bb) {
         STEP step;
         const size_t before = cells_of(bb).size();
         if (read_step(t, &step) && is_in_register(step.p, false)) {
-            if (moves_backward(i, bb, t, step)) cell->first = nullptr;
+            if (moves_backward(i, bb, t, step))
+                cell->first = nullptr;
+            else if (moves_to_only_use(bb, t, step))
+                cell->first = nullptr;
+            else if (moves_in_parts(bb->statements, cell, step)) {
+                erase_tree(t);
+                cell->first = nullptr;
+            }
             i += cells_of(bb).size() - before; // what a split added stands in front
             continue;
         }
@@ -363,6 +505,69 @@ USE INCREMENTS::search_from(BBLK* bb, LIST* cell, const STEP& step, int budget, 
     }
 }
 
+// ---- The test of a loop
+
+// What `p == limit` compares p with: an address that the loop leaves alone; what holds it. Null if the test is another
+// one.
+NODE** limit_of(NODE* control, const SYMTAB* p) {
+    NODE* t = control->op == IF ? control->left : nullptr;
+    if (!t || (t->op != EQ && t->op != NEQ)) return nullptr;
+    for (NODE** link : {&t->right, &t->left}) {
+        const NODE* other = link == &t->right ? t->left : t->right;
+        if (other->op != NAME || other->u.sym != p || !equiv_mtypes(other->type, (*link)->type)) continue;
+        const NODE* base = (*link)->op == PLUS && (*link)->right->op == ICON ? (*link)->left : *link;
+        const bool is_address = base->op == UAND && base->left->op == NAME;
+        if (is_address || (base == *link && base->op == NAME && base->u.sym != p && only_its_name_reaches(base->u.sym)))
+            return link;
+    }
+    return nullptr;
+}
+
+// Between the statement and the end of the block only such a test concerns p.
+bool concerns_test_alone(const BBLK* bb, const LIST* cell, const SYMTAB* p) {
+    for (cell = cell->rest; cell->rest; cell = cell->rest)
+        if (sym_appears_in_tree(p, cell->first) || tree_is_EH_SWITCH(cell->first)) return false;
+    return limit_of(bb->branch(), p) && !tree_is_EH_SWITCH(cell->first);
+}
+
+int mentions_of(const SYMTAB* sym) {
+    int count = 0;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            for_each_subtree(static_cast<const NODE*>(s->first),
+                             [&](const NODE* n) { count += n->op == NAME && n->u.sym == sym; });
+    return count;
+}
+
+// The assignment of the block that sets the limit, which nothing but it and the test names; null if there is none.
+NODE* setting_of_limit(const BBLK* preheader, const SYMTAB* limit) {
+    NODE* setting = nullptr;
+    for (const LIST* s = preheader->statements; s; s = s->rest)
+        if (s->first->op == ASG && s->first->left->op == NAME && s->first->left->u.sym == limit) setting = s->first;
+    return setting && setting->right->type->is_pointer() && mentions_of(limit) == 2 ? setting : nullptr;
+}
+
+bool can_move_limit(BBLK* latch, const BBLK* preheader, const SYMTAB* p) {
+    NODE** limit = limit_of(latch->branch(), p);
+    return !limit || (*limit)->op != NAME || setting_of_limit(preheader, (*limit)->u.sym);
+}
+
+NODE* less(NODE* address, long c) {
+    return simp_tree(maketree(MINUS, address, mk_ICON(INT65(c), tp->long_t), address->type), nullptr);
+}
+
+// p lags behind by the step where the test reads it.
+void move_limit(BBLK* latch, const BBLK* preheader, const STEP& step) {
+    NODE** limit = limit_of(latch->branch(), step.p);
+    if (!limit) return;
+    if ((*limit)->op != NAME) {
+        *limit = less(*limit, step.c);
+        return;
+    }
+    NODE* setting = setting_of_limit(preheader, (*limit)->u.sym);
+    setting->right = less(setting->right, step.c);
+}
+
 bool INCREMENTS::moves_forward(BBLK* bb, LIST* cell, const STEP& step) {
     statements_left = MOST_STATEMENTS;
     BBLK* end = nullptr;
@@ -372,10 +577,18 @@ bool INCREMENTS::moves_forward(BBLK* bb, LIST* cell, const STEP& step) {
         absorb_forward(use.umult, cell->first, step);
         return true;
     }
-    return use.kind == USE::NONE && end && !again && moves_around(end, cell, step);
+    if (use.kind == USE::BLOCKED && concerns_test_alone(bb, cell, step.p)) end = bb;
+    return use.kind != USE::HIT && end && !again && moves_around(end, cell, step);
 }
 
 // ---- Around a back edge
+
+bool is_set_in(const BBLK* bb, const SYMTAB* p) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (is_setting(s->first, p) && !tree_is_arg_prolog(s->first) && s->first->right->type->is_pointer())
+            return true;
+    return false;
+}
 
 // p is moved by -c where the loop is entered.
 void set_back(BBLK* preheader, const STEP& step) {
@@ -421,7 +634,10 @@ bool INCREMENTS::moves_around(BBLK* latch, LIST* cell, const STEP& step) {
     if (exit->predecessors->rest && split_exits >= MOST_SPLIT_EXITS) return false;
     BBLK* end = nullptr;
     const USE use = search_from(header, header->statements, step, MOST_BLOCKS_FORWARD + 1, &end);
-    if (use.kind != USE::HIT || !rewrite_is_allowed(cell->first)) return false;
+    if (use.kind != USE::HIT || !can_move_limit(latch, preheader, step.p)) return false;
+    const bool needs_more = limit_of(latch->branch(), step.p) || (step.c > 0 && use.umult->left->op == NAME);
+    if (needs_more && !(is_set_in(preheader, step.p) && is_dead_behind(loops, loop, step.p))) return false;
+    if (!rewrite_is_allowed(cell->first)) return false;
     if (print_debug)
         debug_printf("\n\tBB->DFN [%d-%d] with pre-header %d and exit %d\n"
                      "\tAssignment propagated around back edge of loop: %s\n"
@@ -434,6 +650,7 @@ bool INCREMENTS::moves_around(BBLK* latch, LIST* cell, const STEP& step) {
         list_blocks();
         changed(fact::alias_marks);
     }
+    move_limit(latch, preheader, step);
     step_behind(exit, cell->first, step, cell->psn);
     set_back(preheader, step);
     absorb_forward(use.umult, cell->first, step);

@@ -103,6 +103,75 @@ int members(struct pair* p, struct wide* v, int n) {
     return s;
 }
 
+// Two references take a step each.
+// FUNCTION: pairs
+// COUNT 2: x++
+// COUNT 2: y++
+// NOT: +=2
+long pairs(int* x, int* y, int n) {
+    long s = 0;
+    do {
+        int re = x[0], im = x[1];
+        y[0] = im;
+        y[1] = (int)s;
+        s = s * 3 + re - im;
+        x += 2, y += 2;
+    } while (--n);
+    return s;
+}
+
+// References in an order that takes no step, or half of one.
+// FUNCTION: out_of_order
+// HAS: x += 2
+long out_of_order(int* x, int n) {
+    long s = 0;
+    do {
+        s = s * 3 + x[1];
+        s ^= x[0];
+        s += (x[0] & 1) && x[1];
+        x += 2;
+    } while (--n);
+    return s;
+}
+
+// A limit moves as far as the pointer lags behind; one that is read behind the loop does not.
+// FUNCTION: down_to
+// HAS: /= \*\(\S+ -= 1\)$/
+long down_to(int n, int k) {
+    int *p = a + n, *end = a + k;
+    long s = 0;
+    do s = s * 3 + (p[0] ^ p[0] >> 1);
+    while (--p != end);
+    return s;
+}
+
+// FUNCTION: down_to_read
+long down_to_read(int n, int k) {
+    int *p = a + n, *end = a + k;
+    long s = 0;
+    do s = s * 3 + (p[0] ^ p[0] >> 1);
+    while (--p != end);
+    return s + *p + *end;
+}
+
+// Whatever lies between the one reference and the step of each iteration.
+// FUNCTION: only_use
+// HAS: /= \*\S+\+\+/
+int only_use(int* p, int n) {
+    int peaks = 0, up = 0, high = 0, i;
+    for (i = 0; i < n; i++, p++) {
+        int v = *p;
+        if (up) {
+            if (v > high) high = v;
+            else if (v < high - 3) peaks++, up = 0;
+        } else if (v < 5) {
+            if (peaks > 7) break;
+            up = 1, high = v;
+        }
+    }
+    return peaks * 100 + high;
+}
+
 // The pointer is read behind the loop, and where the loop is left early.
 int* read_behind(int* p, int n) {
     do {
@@ -139,5 +208,9 @@ int main(void) {
     put_i16(members(ps, ws, 6));
     put_i16((int)(read_behind(a + 30, 5) - a)), put_i16((int)(read_behind(a + 39, 30) - a));
     put_i16(given_address(b, 20));
+    put_i32(pairs(a, b, 9)), put_i16(b[17] + b[18]);
+    put_i32(out_of_order(a, 9)), put_i32(out_of_order(b, 1));
+    put_i32(down_to(30, 3)), put_i32(down_to(4, 3)), put_i32(down_to_read(30, 3));
+    put_i16(only_use(a, 40)), put_i16(only_use(b, 17)), put_i16(only_use(b, 0));
     return 0;
 }

@@ -68,3 +68,4 @@ bool is_an_array_reference(const NODE* lvalue);
 unsigned pointee_alignment(const NODE* pointer, struct LOOP* loop);
 unsigned nonaligned_pointee_alignment(const NODE* pointer, struct LOOP* loop); // not trusting the pointer's own type
 unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop);
+bool is_lvalue_sufficiently_aligned(const NODE* lvalue, unsigned bits, struct LOOP* loop);

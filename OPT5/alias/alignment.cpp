@@ -66,3 +66,7 @@ unsigned lvalue_alignment(const NODE* lvalue, struct LOOP* loop) {
     if (t->op == UMULT && !t->right) return std::max(pointee_alignment(t->left, loop), overall_PT_align(PT_info_of(t)));
     return alignment_of_form(address_form(t), true);
 }
+
+bool is_lvalue_sufficiently_aligned(const NODE* lvalue, unsigned bits, struct LOOP* loop) {
+    return lvalue_alignment(lvalue, loop) >= bits;
+}

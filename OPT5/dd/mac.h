@@ -25,8 +25,8 @@ bool conversion_to_BIF_call_succeeds(LIST* cell, bool allow_s16);
 // aligned.
 bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell);
 
-// acc op= R, where R holds a multiplication: `t = x * y; acc op= R'` with a new t, in two cells from `cell` on. Whether
-// there was one; its temporary.
+// acc op= R, where R holds a multiplication (see `is_mac`): `t = x * y; acc op= R'` with a new t, in two cells from `cell` on.
+// Its temporary.
 SYMTAB* split_out_multiply(LIST* cell);
 
 // An accumulation whose right side holds a multiplication for the hardware, and not the accumulator.

@@ -21,6 +21,7 @@
 #include "OPT5/simp/symbolic.h"
 #include "OPT5/target/accumulators.h"
 #include "OPT5/target/bif.h"
+#include "OPT5/target/mac_operands.h"
 #include "OPT5/target/target.h"
 
 #include <string>
@@ -30,24 +31,15 @@ namespace {
 
 constexpr int HIGH_HALF = 32;
 
-bool is_signed(const TYPE* t, uint64_t bits) { return t->is_int() && t->is_signed() && t->size == bits; }
-bool is_float(const TYPE* t, uint64_t bits) { return t->is_float() && t->size == bits; }
+// A conversion from half of the bits.
+bool widens(const NODE* t, uint64_t to) {
+    if (t->op != SCONV) return false;
+    return to == 32 ? is_an_s32_operand(t) && is_an_s16_operand(t->left)
+                    : is_an_s64_operand(t) && is_an_s32_operand(t->left);
+}
+NODE** below_conversion(NODE** link, uint64_t to) { return widens(*link, to) ? &(*link)->left : link; }
+const NODE* without_conversion(const NODE* t, uint64_t to) { return widens(t, to) ? t->left : t; }
 
-NODE** below_conversion(NODE** link, uint64_t to, uint64_t from) {
-    NODE* t = *link;
-    return t->op == SCONV && is_signed(t->type, to) && is_signed(t->left->type, from) ? &t->left : link;
-}
-const NODE* without_conversion(const NODE* t, uint64_t to, uint64_t from) {
-    return *below_conversion(const_cast<NODE**>(&t), to, from);
-}
-
-bool is_loaded(const NODE* t, uint64_t bits) { return t->op == UMULT && is_signed(t->type, bits); }
-// A constant was converted where it was read.
-bool is_a_constant_of(const NODE* t, uint64_t wide, uint64_t bits) {
-    if (t->op != ICON || !is_signed(t->type, wide)) return false;
-    const INT65 end = INT65(1) << INT65(static_cast<int64_t>(bits - 1));
-    return t->u.lval >= -end && t->u.lval < end;
-}
 bool is_accumulation(const NODE* t) {
     return (t->op == PLUSASG || t->op == MINUSASG) && is_a_likely_zelkova_accumulator(t->left, false);
 }
@@ -72,38 +64,50 @@ struct PRODUCT {
     NODE* multiply = nullptr; // the MULT itself
 };
 
-bool has_factors(const NODE* m, uint64_t wide, uint64_t bits) {
+// One from memory goes first.
+bool are_halves(const NODE* x, const NODE* y) {
+    return is_an_s16_UMULT_operand(x) && (is_an_s16_operand(y) || is_an_s16_constant_operand(y));
+}
+bool are_words(const NODE* x, const NODE* y) { return is_an_s32_UMULT_operand(x) && is_an_s32_operand(y); }
+
+bool multiplies_halves(const NODE* m) {
     if (m->op != MULT) return false;
-    const NODE *a = without_conversion(m->left, wide, bits), *b = without_conversion(m->right, wide, bits);
-    if (bits == 16 && is_a_constant_of(b, wide, bits)) return is_loaded(a, bits);
-    return is_signed(a->type, bits) && is_signed(b->type, bits) && (is_loaded(a, bits) || is_loaded(b, bits));
+    const NODE *a = without_conversion(m->left, 32), *b = without_conversion(m->right, 32);
+    return are_halves(a, b) || are_halves(b, a);
+}
+bool multiplies_words(const NODE* m) {
+    if (m->op != MULT) return false;
+    const NODE *a = without_conversion(m->left, 64), *b = without_conversion(m->right, 64);
+    return are_words(a, b) || are_words(b, a);
 }
 
 // The 32-bit value of the product of 32-bit factors that `link` holds.
 PRODUCT long_product(NODE** link) {
     NODE* t = *link;
-    if (is_signed(t->type, 32) && has_factors(t, 64, 32)) return {LOW, link, t};
-    if (t->op != SCONV || !is_signed(t->type, 32) || !is_signed(t->left->type, 64)) return {};
+    if (print_debug) debug_printf("~~~#S64lo#1 %s\n", tree_to_infix(t).c_str());
+    if (is_an_s32_operand(t) && multiplies_words(t)) return {LOW, link, t};
+    if (t->op != SCONV || !is_an_s32_operand(t) || !is_an_s64_operand(t->left)) return {};
     NODE* inner = t->left;
-    if (has_factors(inner, 64, 32)) return {LOW, link, inner};
-    if (is_constant_shift(inner, HIGH_HALF, HIGH_HALF + 6) && is_signed(inner->left->type, 64) &&
-        has_factors(inner->left, 64, 32))
+    if (multiplies_words(inner)) return {LOW, link, inner};
+    if (print_debug) debug_printf("~~~#S64hi#1 %s\n", tree_to_infix(inner).c_str());
+    if (is_constant_shift(inner, HIGH_HALF, HIGH_HALF + 6) && is_an_s64_operand(inner->left) &&
+        multiplies_words(inner->left))
         return {HIGH, link, inner->left};
     return {};
 }
 
 PRODUCT product_in(NODE** link) {
     NODE* t = *link;
-    const bool is_double = is_float(t->type, 64);
-    if (is_double || is_float(t->type, 32)) {
+    const bool is_double = is_an_f64_operand(t);
+    if (is_double || is_an_f32_operand(t)) {
         const bool multiplies =
             t->op == MULT && equiv_mtypes(t->left->type, t->type) && equiv_mtypes(t->right->type, t->type);
         const bool has_unit = is_double ? is_fpu64 : has_hardware_float();
         return multiplies && has_unit ? PRODUCT{FLOATING, link, t} : PRODUCT{};
     }
-    if (!is_signed(t->type, 32)) return {};
+    if (!is_an_s32_operand(t)) return {};
     // x << 3 of a value in memory is a product with 8.
-    if (t->op == SLL && is_loaded(t->left, 32) && t->right->op == ICON && t->right->u.lval >= INT65(2) &&
+    if (t->op == SLL && is_an_s32_UMULT_operand(t->left) && t->right->op == ICON && t->right->u.lval >= INT65(2) &&
         t->right->u.lval < INT65(31)) {
         t->op = MULT;
         t->right->u.lval = INT65(1) << t->right->u.lval;
@@ -111,13 +115,13 @@ PRODUCT product_in(NODE** link) {
     }
     if (PRODUCT p = long_product(link); p.kind != NO_PRODUCT) return p;
     // The hardware's product has 32 bits: of a 16-bit one it must be known that nothing is lost.
-    if (NODE** m = below_conversion(link, 32, 16); m != link)
-        return has_factors(*m, 16, 16) && operation_is_exact(*m, nullptr) ? PRODUCT{HALVES, link, *m} : PRODUCT{};
+    if (NODE** m = below_conversion(link, 32); m != link)
+        return multiplies_halves(*m) && operation_is_exact(*m, nullptr) ? PRODUCT{HALVES, link, *m} : PRODUCT{};
     int shift = 0;
     const NODE* below = strip_right_shift(strip_left_shift(t, &shift), &shift);
-    if (below != t && (below != t->left || !is_signed(below->type, 32))) return {};
+    if (below != t && (below != t->left || !is_an_s32_operand(below))) return {};
     NODE** place = below == t ? link : &t->left;
-    if (has_factors(*place, 32, 16)) return {HALVES, place, *place};
+    if (multiplies_halves(*place)) return {HALVES, place, *place};
     return below == t ? PRODUCT{} : long_product(place);
 }
 
@@ -222,15 +226,17 @@ void split_accumulations_in_bb(BBLK* bb) {
 SYMTAB* split_out_multiply(LIST* cell) {
     NODE* t = cell->first;
     const PRODUCT p = product_in(&t->right);
-    if (p.kind == NO_PRODUCT) return nullptr;
+    NODE *multiply_part = p.multiply, **place_to_insert_temp = p.link;
+    OPT_ASSERT(multiply_part != NULL);
+    OPT_ASSERT(*place_to_insert_temp != NULL);
     TYPE* type = t->left->type->stqs();
     SYMTAB* temp = sym_temp('T', -1, type, nullptr);
-    NODE* product = *p.link;
-    *p.link = mk_NAME(temp);
+    NODE* product = *place_to_insert_temp;
+    *place_to_insert_temp = mk_NAME(temp);
     if (p.kind == HIGH) {
         NODE* shift = product->left->right;
         if (const INT65 rest = shift->u.lval - INT65(HIGH_HALF); !rest.is_zero())
-            *p.link = maketree(SRL, *p.link, mk_ICON(rest, tp->int_t), type);
+            *place_to_insert_temp = maketree(SRL, *place_to_insert_temp, mk_ICON(rest, tp->int_t), type);
         shift->u.lval = INT65(HIGH_HALF);
     }
     NODE* accumulation = cell->first;
@@ -243,9 +249,9 @@ SYMTAB* split_out_multiply(LIST* cell) {
 
 namespace {
 
-NODE* reference_to(const NODE* name) {
-    OPT_ASSERT(name->op == NAME && is_a_likely_zelkova_register(name->u.sym));
-    return maketree(ARGREF, copy_tree(name), nullptr, tp->mk_ptr(name->type));
+NODE* reference_to(const NODE* opd) {
+    OPT_ASSERT(opd->op == NAME && is_a_likely_zelkova_register(opd->u.sym));
+    return maketree(ARGREF, copy_tree(opd), nullptr, tp->mk_ptr(opd->type));
 }
 
 NODE* chain(std::initializer_list<NODE*> args) {
@@ -262,8 +268,10 @@ NODE* take(NODE** link) {
 
 // Takes the place of two statements, whose trees the caller no longer needs.
 void set_call(LIST* cell, const std::string& name, NODE* args) {
+    NODE* tree = mk_MCALL(name.c_str(), args, tp->void_t);
+    OPT_ASSERT(tree != NULL && cell->rest != NULL && tree_has_side_effects(tree));
     erase_tree(cell->first);
-    cell->first = mk_MCALL(name.c_str(), args, tp->void_t);
+    cell->first = tree;
     drop_statement_behind(cell);
 }
 
@@ -289,29 +297,26 @@ bool read_pair(LIST* cell, bool allow_s16, PAIR* pair) {
     return shift <= 6;
 }
 
-// The factor from memory goes first.
-void order_factors(NODE** x, NODE** y, uint64_t bits) {
-    if (!is_loaded(*x, bits)) std::swap(*x, *y);
-}
-
 bool convert_product(LIST* cell, PAIR& pair) {
     const PRODUCT product = product_in(&pair.mult->right);
     const bool is_whole = product.kind != NO_PRODUCT && product.link == &pair.mult->right;
-    if (!is_whole || product.kind == FLOATING || !is_signed(pair.p->type, 32)) return false;
+    if (!is_whole || product.kind == FLOATING || !is_an_s32_operand(pair.p)) return false;
     if (product.kind == HIGH && !is_constant_shift(pair.mult->right->left, HIGH_HALF, HIGH_HALF)) return false;
-    const uint64_t bits = product.kind == HALVES ? 16 : 32;
+    const bool is_short = product.kind == HALVES;
     NODE* m = product.multiply;
-    NODE** a = below_conversion(&m->left, 2 * bits, bits);
-    NODE** b = below_conversion(&m->right, 2 * bits, bits);
-    const bool is_square = bits == 16 && trees_are_congruent(*a, *b, false) && !lvalue_is_volatile(*a);
+    NODE** a = below_conversion(&m->left, is_short ? 32 : 64);
+    NODE** b = below_conversion(&m->right, is_short ? 32 : 64);
+    const bool is_square = is_short && trees_are_congruent(*a, *b, false) && !lvalue_is_volatile(*a);
     NODE *x = take(a), *y = take(b);
-    order_factors(&x, &y, bits);
-    if (y->op == ICON && bits == 16) y->type = tp->int_t;
+    if (!(is_short ? are_halves(x, y) : are_words(x, y))) std::swap(x, y);
+    if (is_short && y->op == ICON) y->type = tp->int_t;
     NODE *acc = reference_to(pair.accm->left), *p = reference_to(pair.mult->left);
     NODE* shift = mk_ICON(pair.shift, tp->int_t);
+    OPT_ASSERT(is_an_s32_RW_register_operand(acc) && is_an_s32_RW_register_operand(p));
+    OPT_ASSERT(is_an_s16_PM_constant_operand(shift, false));
     std::string name = is_square ? "__parallel_sqr_" : "__parallel_mpy_";
     name += pair.adds() ? "add" : "sub";
-    if (bits == 32) name += product.kind == HIGH ? "_s32_hi" : "_s32_lo";
+    if (!is_short) name += product.kind == HIGH ? "_s32_hi" : "_s32_lo";
     if (is_square) erase_tree(y);
     set_call(cell, name, is_square ? chain({x, acc, p, shift}) : chain({x, y, acc, p, shift}));
     return true;
@@ -322,7 +327,8 @@ bool convert_float(LIST* cell, PAIR& pair) {
     NODE* m = pair.mult->right;
     const PRODUCT product = product_in(&pair.mult->right);
     if (product.kind != FLOATING || !pair.adds() || pair.accm->right != pair.p) return false;
-    const bool a = m->left->op == UMULT, b = m->right->op == UMULT;
+    auto is_loaded = [](const NODE* t) { return is_an_f32_UMULT_operand(t) || is_an_f64_UMULT_operand(t); };
+    const bool a = is_loaded(m->left), b = is_loaded(m->right);
     if (a != b || (a && !rtc_unified_memory)) return false;
     const char* name = m->type->size == 64 ? "__parallel_mpy_add_f64" : "__parallel_mpy_add_f32";
     NODE *x = take(&m->left), *y = take(&m->right);
@@ -355,15 +361,15 @@ struct DUAL {
 
 // acc += x * y, both of 16 bits and from memory.
 bool read_dual(NODE* t, int k, DUAL* d) {
-    if (t->op != PLUSASG || !is_a_likely_zelkova_accumulator(t->left, false) || !is_signed(t->left->type, 32))
+    if (t->op != PLUSASG || !is_a_likely_zelkova_accumulator(t->left, false) || !is_an_s32_operand(t->left))
         return false;
     const PRODUCT p = product_in(&t->right);
     if (p.kind != HALVES || p.multiply != *p.link || sym_appears_in_tree(t->left->u.sym, t->right)) return false;
     strip_right_shift(strip_left_shift(t->right, &d->shift[k]), &d->shift[k]);
     d->mac[k] = t;
-    d->x[k] = below_conversion(&p.multiply->left, 32, 16);
-    d->y[k] = below_conversion(&p.multiply->right, 32, 16);
-    return is_loaded(*d->x[k], 16) && is_loaded(*d->y[k], 16);
+    d->x[k] = below_conversion(&p.multiply->left, 32);
+    d->y[k] = below_conversion(&p.multiply->right, 32);
+    return is_an_s16_UMULT_operand(*d->x[k]) && is_an_s16_UMULT_operand(*d->y[k]);
 }
 
 // Whether `b` reads the 16-bit word behind the one that `a` reads.

@@ -81,7 +81,7 @@ bool DUAL_LOOP::is_suitable() {
 bool DUAL_LOOP::is_aligned_at_entry(const NODE* umult) const {
     NODE* first = find_expr_init(umult, loop);
     if (!first) return false;
-    bool is_aligned = first->op == UMULT && lvalue_alignment(first, loop->parent) >= WORD;
+    bool is_aligned = first->op == UMULT && is_lvalue_sufficiently_aligned(first, WORD, loop->parent);
     if (!is_aligned && first->op == UMULT) {
         NODE* address = coerce_to_type(tp->long_t, copy_tree(first->left));
         const bool base = (max_ICON_factor(address, loop->parent) % INT65(2)).is_zero();
@@ -146,7 +146,7 @@ bool DUAL_LOOP::convert_pair() {
     };
     // The second one's accesses are those behind these.
     auto is_aligned = [&](const NODE* n) {
-        return lvalue_alignment(n, loop) >= WORD || (!any_subtree(n, moves_otherwise) && is_aligned_at_entry(n));
+        return is_lvalue_sufficiently_aligned(n, WORD, loop) || (!any_subtree(n, moves_otherwise) && is_aligned_at_entry(n));
     };
     auto is_misaligned = [&](const NODE* n) { return n->op == UMULT && !is_aligned(n); };
     LIST* copy = copy_dd_statements(bb->statements);

@@ -198,10 +198,6 @@ private:
 bool ROTATOR::simply(MAC_LOOP& r, LIST* cell) {
     LIST* pair = mkelist(copy_tree(cell->first), nullptr, cell->psn);
     SYMTAB* temp = split_out_multiply(pair);
-    if (!temp) {
-        erase_tree_list(pair);
-        return false;
-    }
     std::swap(pair->first, pair->rest->first);
     NODE* late = copy_tree(pair->first);
     NODE* zero = mk_ASG(mk_NAME(temp), neutral(late));

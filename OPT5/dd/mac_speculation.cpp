@@ -129,7 +129,6 @@ private:
     LIST* prologue = nullptr; // ends in the multiplication
     LIST* rest = nullptr;     // begins with the accumulation; without the test
     LIST* kernel = nullptr;
-    SYMTAB* temp = nullptr;
     NODE* test = nullptr; // of the iteration whose prologue is through
 };
 
@@ -151,9 +150,9 @@ bool SPECULATION::cut() {
     squares.read_from_memory(body);
     LIST* cell = body;
     while (cell && !is_mac(cell->first)) cell = cell->rest;
-    if (cell) temp = split_out_multiply(cell);
     prologue = body;
-    if (!temp) return false;
+    if (!cell) return false;
+    split_out_multiply(cell);
     rest = std::exchange(cell->rest, nullptr);
     return true;
 }
@@ -344,8 +343,8 @@ void SPECULATION::drop() {
 }
 
 bool SPECULATION::succeeds() {
-    const bool is_rebuilt = may_be_cut() && cut() && (test = test_ahead()) && make_kernel() &&
-                            rewrite_is_allowed(loop.block->branch());
+    const bool is_rebuilt =
+        may_be_cut() && cut() && (test = test_ahead()) && make_kernel() && rewrite_is_allowed(loop.block->branch());
     if (is_rebuilt) rebuild();
     drop();
     return is_rebuilt;

@@ -3,6 +3,7 @@
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
+#include "OPT5/target/mac_operands.h"
 #include "OPT5/target/target.h"
 
 #include <utility>
@@ -12,10 +13,6 @@ namespace {
 // ---- Types
 bool is_signed_of(const TYPE* t, uint64_t bits) { return t->is_int() && t->is_signed() && t->size == bits; }
 bool is_float_of(const TYPE* t, uint64_t bits) { return t->is_float() && t->size == bits; }
-bool is_s16(const NODE* t) { return is_signed_of(t->type, 16); }
-bool is_s32(const NODE* t) { return is_signed_of(t->type, 32); }
-bool is_s64(const NODE* t) { return is_signed_of(t->type, 64); }
-
 bool is_conversion(const NODE* t, uint64_t to, uint64_t from) {
     return t->op == SCONV && is_signed_of(t->type, to) && is_signed_of(t->left->type, from);
 }
@@ -43,16 +40,16 @@ const NODE* product_of_halves(const NODE* t, bool strip) {
         m = m->left;
     else if (strip)
         m = without_shifts(m, &shift);
-    if (m->op != MULT || !(is_s32(m) || is_s16(m))) return nullptr;
+    if (m->op != MULT || !(is_an_s32_operand(m) || is_an_s16_operand(m))) return nullptr;
     return are_factors(without_conversion(m->left, 32, 16), without_conversion(m->right, 32, 16), 16) ? m : nullptr;
 }
 
 // A shift to the left by a constant is a product as well.
 bool is_long_product(const NODE* m) {
     const bool multiplies = m->op == MULT || (m->op == SLL && m->right->op == ICON);
-    if (!multiplies || !(is_s64(m->left) || is_s32(m->left))) return false;
+    if (!multiplies || !(is_an_s64_operand(m->left) || is_an_s32_operand(m->left))) return false;
     const NODE* a = without_conversion(m->left, 64, 32);
-    if (m->op == SLL) return a->op == UMULT && is_s32(a);
+    if (m->op == SLL) return a->op == UMULT && is_an_s32_operand(a);
     return are_factors(a, without_conversion(m->right, 64, 32), 32);
 }
 
@@ -114,7 +111,8 @@ const NODE* strip_left_shift(const NODE* t, int* shift) {
 
 const NODE* strip_right_shift(const NODE* t, int* shift) {
     if (*shift != 0 || t->op != SRL) return t;
-    const bool low = is_count(t->right, 0, 6), high = is_count(t->right, 32, 38) && is_s64(t) && is_s64(t->left);
+    const bool low = is_count(t->right, 0, 6),
+               high = is_count(t->right, 32, 38) && is_an_s64_operand(t) && is_an_s64_operand(t->left);
     if (!low && !high) return t;
     *shift = static_cast<int>(t->right->u.lval.value);
     return t->left;
@@ -128,9 +126,9 @@ const NODE* get_mpy_for_zelkova_mac(const NODE* t, bool strip) {
                 t->op == MULT && is_float_of(t->left->type, bits) && is_float_of(t->right->type, bits);
             return has_unit && multiplies ? t : nullptr;
         }
-    if (is_s32(t) || is_s16(t))
+    if (is_an_s32_operand(t) || is_an_s16_operand(t))
         if (const NODE* m = product_of_halves(t, strip)) return m;
-    if (!is_s64(t) && !is_s32(t)) return nullptr;
+    if (!is_an_s64_operand(t) && !is_an_s32_operand(t)) return nullptr;
     return is_low_product(t, strip) || is_high_product(t, strip) ? t : nullptr;
 }
 

@@ -14,46 +14,6 @@ bool TYPE::is_arithmetic() const {
     }
 }
 
-bool TYPE::is_scalar() const {
-    KIND k = real->kind;
-    return (k >= tpk_int && k <= tpk_ref) || k == tpk_ptm || k == tpk_enum;
-}
-
-// The integer type that carries the sign and rank of an integer or enumeration, null for other types.
-static const TYPE* integer_of(const TYPE* t) {
-    t = t->real;
-    while (t->kind == TYPE::tpk_enum) t = t->component()->real;
-    return t->kind == TYPE::tpk_int ? t : nullptr;
-}
-
-bool TYPE::is_signed() const {
-    const TYPE* t = integer_of(this);
-    if (!t) return false;
-    switch (t->ikind_m) {
-    case ik_schar:
-    case ik_short:
-    case ik_int:
-    case ik_long:
-    case ik_llong: return true;
-    default: return false;
-    }
-}
-
-bool TYPE::is_unsigned() const {
-    const TYPE* t = integer_of(this);
-    if (!t) return false;
-    switch (t->ikind_m) {
-    case ik_uchar:
-    case ik_ushort:
-    case ik_uint:
-    case ik_ulong:
-    case ik_ullong: return true;
-    default: return false;
-    }
-}
-
-bool TYPE::is_bool() const { return real->kind == tpk_int && (real->ikind_m == ik_bool || real->boolean_m); }
-
 bool TYPE::is_plain_char() const { return (is_schar() || is_uchar()) && !real->expl_sign_m; }
 
 bool TYPE::is_complete() const {
@@ -94,7 +54,7 @@ bool TYPE::has_flex_array_member() const {
 
 int TYPE::rank() const {
     static const int ranks[] = {0, 1, 1, 1, 2, 2, 3, 3, 4, 4, 5, 5};
-    const TYPE* t = integer_of(this);
+    const TYPE* t = integer();
     if (!t) tp_die("Bad kind:  TYPE::rank()");
     return ranks[t->ikind_m];
 }

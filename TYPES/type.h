@@ -223,12 +223,19 @@ public:
     bool is_csu() const { return real->kind >= tpk_class; }
     bool is_udt() const { return real->kind >= tpk_enum; }
     bool is_arithmetic() const;
-    bool is_scalar() const;
+    bool is_scalar() const {
+        const KIND k = real->kind;
+        return (k >= tpk_int && k <= tpk_ref) || k == tpk_ptm || k == tpk_enum;
+    }
     // An integer of kinds `signed char` and the like, or an enumeration by its underlying type. `bool` and `wchar_t`
     // are neither signed nor unsigned.
-    bool is_signed() const;
-    bool is_unsigned() const;
-    bool is_bool() const;       // of kind `bool`, or marked boolean
+    bool is_signed() const {
+        return has_integer_kind(1u << ik_schar | 1u << ik_short | 1u << ik_int | 1u << ik_long | 1u << ik_llong);
+    }
+    bool is_unsigned() const {
+        return has_integer_kind(1u << ik_uchar | 1u << ik_ushort | 1u << ik_uint | 1u << ik_ulong | 1u << ik_ullong);
+    }
+    bool is_bool() const { return real->kind == tpk_int && (real->ikind_m == ik_bool || real->boolean_m); } // or marked so
     bool is_plain_char() const; // `char` written without `signed` or `unsigned`
     bool is_ikind(IKIND k) const { return real->kind == tpk_int && real->ikind_m == k; }
     bool is_fkind(FKIND k) const { return real->kind == tpk_float && real->fkind_m == k; }
@@ -335,6 +342,16 @@ private:
     explicit TYPE(KIND k) : kind(k), real(this) {}
     void take_component(TYPE* t); // sets `target_m` and what follows from it: `real` and the qualifier bits
     uint64_t shape_hash() const;
+    // The integer type that carries the sign and rank of an integer or enumeration, null for other types.
+    const TYPE* integer() const {
+        const TYPE* t = real;
+        while (t->kind == tpk_enum) t = t->target_m->real;
+        return t->kind == tpk_int ? t : nullptr;
+    }
+    bool has_integer_kind(unsigned kinds) const { // one of these, a bit each
+        const TYPE* t = integer();
+        return t && (kinds >> t->ikind_m & 1);
+    }
     ~TYPE();
 
     IKIND ikind_m = ik_int;

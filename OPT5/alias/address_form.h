@@ -4,6 +4,8 @@
 #include "OPT5/simp/linear.h"
 #include "XINT/int65.h"
 
+#include <optional>
+
 class NODE;
 class SYMTAB;
 struct LOOP;
@@ -21,6 +23,30 @@ struct ADDRESS_FORM : LINEAR_FORM {
 };
 
 ADDRESS_FORM address_form(const NODE* lvalue);
+// An lvalue that is compared with many: what the comparisons ask of it alone is found once. The tree must stand, and what
+// is known of pointers.
+class COMPARED_LVALUE {
+public:
+    explicit COMPARED_LVALUE(const NODE* lvalue);
+    const NODE* tree() const { return lvalue; } // without wrappers
+    bool is_lvalue() const { return is_place; }
+    bool is_volatile() const { return volatile_place; }
+    const SYMTAB* object_named() const { return named; } // by the lvalue itself, or null
+    const ADDRESS_FORM& form() const {
+        if (!known_form) known_form.emplace(address_form(lvalue));
+        return *known_form;
+    }
+
+private:
+    const NODE* lvalue;
+    bool is_place, volatile_place = false;
+    const SYMTAB* named = nullptr;
+    mutable std::optional<ADDRESS_FORM> known_form;
+};
+// What `lvalues_may_be_aliased` (alias.h) answers.
+bool lvalues_may_be_aliased(const COMPARED_LVALUE& a, const COMPARED_LVALUE& b, struct LOOP* loop = nullptr,
+                            bool by_type = true, bool* unsure = nullptr);
+
 ADDRESS_FORM pointer_form(const NODE* pointer); // the place that it points to; no width, no `points_into` of one access
 
 // Whether two accesses are apart wherever the second lies `distance` bits behind the first, plus any multiple of `step`;

@@ -147,7 +147,7 @@ static bool may_share_stack(TYPE* a, TYPE* b) {
 }
 
 // The object whose name stands in the lvalue itself, or null.
-static const SYMTAB* object_named(const NODE* t) {
+static const SYMTAB* object_named_in(const NODE* t) {
     for (;;) {
         t = without_wrappers(t);
         if (t->op == STDOT && t->right && t->right->mval)
@@ -159,20 +159,29 @@ static const SYMTAB* object_named(const NODE* t) {
     }
 }
 
+COMPARED_LVALUE::COMPARED_LVALUE(const NODE* t) : lvalue(without_wrappers(t)), is_place(::is_lvalue(lvalue)) {
+    if (!is_place) return;
+    volatile_place = lvalue_is_volatile(lvalue);
+    named = object_named_in(lvalue);
+}
+
 bool lvalues_may_be_aliased(const NODE* a, const NODE* b, struct LOOP* loop, bool by_type, bool* unsure) {
-    a = without_wrappers(a);
-    b = without_wrappers(b);
-    if (!is_lvalue(a) || !is_lvalue(b)) {
+    return lvalues_may_be_aliased(COMPARED_LVALUE(a), COMPARED_LVALUE(b), loop, by_type, unsure);
+}
+
+bool lvalues_may_be_aliased(const COMPARED_LVALUE& of_a, const COMPARED_LVALUE& of_b, struct LOOP* loop, bool by_type,
+                            bool* unsure) {
+    const NODE *a = of_a.tree(), *b = of_b.tree();
+    if (!of_a.is_lvalue() || !of_b.is_lvalue()) {
         if (unsure) *unsure = true;
         return true;
     }
-    if (lvalue_is_volatile(a) && lvalue_is_volatile(b))
-        return true; // what their order is for may lie outside of memory
+    if (of_a.is_volatile() && of_b.is_volatile()) return true; // what their order is for may lie outside of memory
     // That only one is volatile says nothing: a plain object may be written through a pointer to volatile.
     if (a->op == NAME && b->op == NAME) return object_symbols_may_alias(a->u.sym, b->u.sym);
-    if (const SYMTAB* named = object_named(a))
-        if (const SYMTAB* other = object_named(b); other && other != named) return object_symbols_may_alias(named, other);
-    const ADDRESS_FORM x = address_form(a), y = address_form(b);
+    if (const SYMTAB *named = of_a.object_named(), *other = of_b.object_named(); named && other && other != named)
+        return object_symbols_may_alias(named, other);
+    const ADDRESS_FORM &x = of_a.form(), &y = of_b.form();
     const SYMTAB *object_a = x.known_object(), *object_b = y.known_object();
     if (object_a && object_b) {
         if (object_a == object_b)

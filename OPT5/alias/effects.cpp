@@ -117,21 +117,21 @@ bool is_inert(int op) {
 
 bool is_operation_on_memory(int op) { return op_is_call(op) || op_is_intrinsic(op) || op == MEMCPY; }
 
-bool place_may_meet(const NODE* place, const NODE* lvalue) {
+bool place_may_meet(const NODE* place, const COMPARED_LVALUE& lvalue) {
     bool meets = false;
-    effects::visit_places(nullptr, place, [&meets, lvalue](const WRITE& w) {
-        meets = meets || lvalues_may_be_aliased(access_of_place(w.place), lvalue);
+    effects::visit_places(nullptr, place, [&](const WRITE& w) {
+        meets = meets || lvalues_may_be_aliased(COMPARED_LVALUE(access_of_place(w.place)), lvalue);
     });
     return meets;
 }
 
-// One node of a tree, its operands aside. `is_volatile`: the lvalue is.
-bool node_may_modify(const NODE* t, const NODE* lvalue, bool is_volatile) {
+// One node of a tree, its operands aside.
+bool node_may_modify(const NODE* t, const COMPARED_LVALUE& lvalue) {
     if (writes_left_operand(t->op)) return !t->left || place_may_meet(t->left, lvalue);
-    if (is_operation_on_memory(t->op)) return call_may_modify(t, lvalue);
-    if (t->op == ASM) return asm_may_access(t, lvalue);
+    if (is_operation_on_memory(t->op)) return call_may_modify(t, lvalue.tree());
+    if (t->op == ASM) return asm_may_access(t, lvalue.tree());
     // A volatile access is an event, that keeps its order to other events.
-    if (is_lvalue(t)) return is_volatile && lvalue_is_volatile(t);
+    if (is_lvalue(t)) return lvalue.is_volatile() && lvalue_is_volatile(t);
     return op_has_effect(t->op) && !op_transfers_control(t->op) && !is_inert(t->op);
 }
 
@@ -229,14 +229,16 @@ const void* pure_callee(const NODE* call) {
     return reads_memory ? nullptr : callee;
 }
 
-bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) {
-    const bool is_volatile = lvalue_is_volatile(lvalue);
-    return any_subtree(a, [=](const NODE* t) { return node_may_modify(t, lvalue, is_volatile); });
+static bool tree_may_modify(const NODE* a, const COMPARED_LVALUE& lvalue) {
+    return any_subtree(a, [&](const NODE* t) { return node_may_modify(t, lvalue); });
 }
 
+bool tree_modifies_lvalue(const NODE* a, const NODE* lvalue) { return tree_may_modify(a, COMPARED_LVALUE(lvalue)); }
+
 bool tree_touches_lvalue(const NODE* a, const NODE* lvalue) {
-    if (tree_modifies_lvalue(a, lvalue)) return true;
-    if (any_lvalue_read(a, [lvalue](const NODE* t) { return lvalues_may_be_aliased(t, lvalue); })) return true;
+    const COMPARED_LVALUE place(lvalue);
+    if (tree_may_modify(a, place)) return true;
+    if (any_lvalue_read(a, [&](const NODE* t) { return lvalues_may_be_aliased(COMPARED_LVALUE(t), place); })) return true;
     return any_subtree(a,
                        [lvalue](const NODE* t) { return is_operation_on_memory(t->op) && call_may_read(t, lvalue); });
 }
@@ -284,48 +286,53 @@ static bool acts_on_memory(const NODE* t) {
 }
 
 size_t ACCESS_LISTS::add(const NODE* tree) {
-    RANGE r{tree, nodes.size(), 0, 0};
+    RANGE r{tree, acts.size(), 0, places.size(), 0, 0};
     for_each_subtree(tree, [this](const NODE* t) {
-        if (acts_on_memory(t)) nodes.push_back(t);
+        if (!acts_on_memory(t)) return;
+        for_each_write_of_node(t, [this](const WRITE& w) {
+            if (w.place) places.emplace_back(access_of_place(w.place));
+        });
+        acts.push_back({t, places.size()});
     });
-    r.reads = nodes.size();
+    r.acts_end = acts.size();
+    r.reads = places.size();
     any_lvalue_read(tree, [this](const NODE* t) {
-        nodes.push_back(t);
+        places.emplace_back(t);
         return false;
     });
-    r.end = nodes.size();
+    r.reads_end = places.size();
     trees.push_back(r);
     return trees.size() - 1;
 }
 
 // What the node writes, whatever the types, and what else it does.
-static bool node_may_touch(const NODE* t, const NODE* lvalue, bool is_volatile) {
+bool ACCESS_LISTS::act_may_touch(const ACT& act, size_t from, const COMPARED_LVALUE& lvalue) const {
+    const NODE* t = act.node;
     const bool writes_left = writes_left_operand(t->op) && t->left;
-    if (!writes_left && node_may_modify(t, lvalue, is_volatile)) return true;
-    if (is_operation_on_memory(t->op) && call_may_read(t, lvalue)) return true;
-    bool meets = false;
-    for_each_write_of_node(t, [&](const WRITE& w) {
-        meets = meets || (w.place && lvalues_may_be_aliased(access_of_place(w.place), lvalue, nullptr, false));
-    });
-    return meets;
+    if (!writes_left && node_may_modify(t, lvalue)) return true;
+    if (is_operation_on_memory(t->op) && call_may_read(t, lvalue.tree())) return true;
+    for (size_t i = from; i < act.places_end; ++i)
+        if (lvalues_may_be_aliased(places[i], lvalue, nullptr, false)) return true;
+    return false;
 }
 
-bool ACCESS_LISTS::touches(size_t number, const NODE* lvalue) const {
+bool ACCESS_LISTS::touches(size_t number, const COMPARED_LVALUE& lvalue) const {
     const RANGE& r = trees[number];
-    auto any = [this](size_t from, size_t to, auto predicate) {
-        return std::any_of(nodes.begin() + static_cast<long>(from), nodes.begin() + static_cast<long>(to), predicate);
-    };
-    const bool is_volatile = lvalue_is_volatile(lvalue);
-    if (any(r.acts, r.reads, [=](const NODE* t) { return node_may_touch(t, lvalue, is_volatile); })) return true;
-    if (any(r.reads, r.end, [=](const NODE* t) { return lvalues_may_be_aliased(t, lvalue); })) return true;
-    if (name_accessed(lvalue)) return false; // of a fixed address
-    if (r.acts != r.reads && any_lvalue_read(lvalue, [&](const NODE* part) {
-            if (part == lvalue) return false;
-            const bool is_volatile_part = lvalue_is_volatile(part);
-            return any(r.acts, r.reads, [=](const NODE* t) { return node_may_modify(t, part, is_volatile_part); });
+    for (size_t i = r.acts, place = r.places; i < r.acts_end; place = acts[i++].places_end)
+        if (act_may_touch(acts[i], place, lvalue)) return true;
+    for (size_t i = r.reads; i < r.reads_end; ++i)
+        if (lvalues_may_be_aliased(places[i], lvalue)) return true;
+    const NODE* t = lvalue.tree();
+    if (name_accessed(t)) return false; // of a fixed address
+    if (r.acts != r.acts_end && any_lvalue_read(t, [&](const NODE* part) {
+            if (part == t) return false;
+            const COMPARED_LVALUE of_part(part);
+            for (size_t i = r.acts; i < r.acts_end; ++i)
+                if (node_may_modify(acts[i].node, of_part)) return true;
+            return false;
         }))
         return true;
-    return tree_contains_op(lvalue, ASM) || may_change_what_calls_read(r.tree, lvalue);
+    return tree_contains_op(t, ASM) || may_change_what_calls_read(r.tree, t);
 }
 
 // ---- What a tree reads

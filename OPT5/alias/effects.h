@@ -5,8 +5,10 @@
 // by what `for_each_written_name` visits and by nothing else.
 #pragma once
 
+#include "OPT5/alias/address_form.h"
 #include "OPT5/ir/walks.h"
 
+#include <deque>
 #include <vector>
 
 class BBLK;
@@ -42,6 +44,7 @@ void visit_places(const NODE* by, const NODE* place, const F& visit) {
 // What one node writes, its operands aside.
 template <class F>
 void for_each_write_of_node(const NODE* t, const F& visit) {
+    if (!(op_traits[t->op] & OP_ACTS)) return;
     if (t->op == ARGREF) // the callee of a machine call gets it to write to
         effects::visit_places(t, t->left, visit);
     else if (t->op == MEMCPY)
@@ -103,14 +106,21 @@ public:
     size_t add(const NODE* tree); // the number to ask by
     // Whether the tree touches the lvalue, or modifies what its address is computed from. Types tell nothing apart from
     // what the tree writes.
-    bool touches(size_t number, const NODE* lvalue) const;
+    bool touches(size_t number, const COMPARED_LVALUE& lvalue) const;
 
 private:
+    struct ACT {
+        const NODE* node;
+        size_t places_end; // those that it writes end there
+    };
     struct RANGE {
         const NODE* tree;
-        size_t acts, reads, end;
+        size_t acts, acts_end, places, reads, reads_end;
     };
-    std::vector<const NODE*> nodes; // of each tree: those that act, then the lvalues it reads
+    bool act_may_touch(const ACT& act, size_t places, const COMPARED_LVALUE& lvalue) const;
+
+    std::vector<ACT> acts;              // of each tree: the nodes that act
+    std::deque<COMPARED_LVALUE> places; // of each tree: those that they write, then the lvalues it reads
     std::vector<RANGE> trees;
 };
 

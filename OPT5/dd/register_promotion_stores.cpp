@@ -75,7 +75,7 @@ private:
     void summarize();
     SUMMARY summary_of(LIST* cell, size_t block);
     void find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& candidates);
-    bool touches(const NODE* tree, size_t& number, const STORED& s);
+    bool touches(const NODE* tree, size_t& number, const COMPARED_LVALUE& place);
     void find_points(STORED& s);
     std::vector<size_t> statements_around(const SSAVAR* v) const;
     void spare_registers();
@@ -169,9 +169,9 @@ void STORE_PROMOTER::find_stored(const std::vector<std::unique_ptr<CANDIDATE>>& 
 
 // The place itself, or the pointer to it. Memory without a declared type takes that of the last store: two stores stay in
 // their order whatever their types.
-bool STORE_PROMOTER::touches(const NODE* tree, size_t& number, const STORED& s) {
+bool STORE_PROMOTER::touches(const NODE* tree, size_t& number, const COMPARED_LVALUE& place) {
     if (number == NOT_LISTED) number = accesses.add(tree);
-    return accesses.touches(number, s.c->variable->tree);
+    return accesses.touches(number, place);
 }
 
 // The statements that may touch the place or the pointer to it, in order: those that name it, and those that may reach
@@ -186,11 +186,12 @@ std::vector<size_t> STORE_PROMOTER::statements_around(const SSAVAR* v) const {
 }
 
 void STORE_PROMOTER::find_points(STORED& s) {
+    const COMPARED_LVALUE place(s.c->variable->tree);
     for (size_t i : statements_around(s.c->variable)) {
         SUMMARY& at = statements[i];
         const bool stores = at.stored == s.c->variable;
         if (!stores && !at.is_barrier) --questions_left;
-        if (stores ? touches(at.assignment->right, at.right_number, s) : at.is_barrier || touches(at.tree, at.number, s))
+        if (stores ? touches(at.assignment->right, at.right_number, place) : at.is_barrier || touches(at.tree, at.number, place))
             s.points.push_back({at.block, nullptr});
         if (stores) s.points.push_back({at.block, at.cell});
     }

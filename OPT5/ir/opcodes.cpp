@@ -19,6 +19,7 @@ uint8_t commute_inv[NO_OPCODES];
 bool boolean_result[NO_OPCODES];
 uint8_t boolean_inv[NO_OPCODES];
 uint8_t op_of_opASG[NO_OPCODES];
+uint8_t op_traits[NO_OPCODES];
 int float_micro_ops_to_op[16];
 
 namespace {
@@ -40,6 +41,15 @@ constexpr ROW rows[] = {
 #undef OPCODE
 };
 
+uint8_t traits_of(int op) {
+    const bool assigns =
+        op == ASG || op == STASG || op == ARASG || op == PLUSPLUS || op == MINMIN || op_of_opASG[op] != ILLOP;
+    const bool writes_left = (side_effects[op] == 1 && !op_is_SSA(op)) || op == ARASG || op == LOOP || op == INITLOOP ||
+                             op == ENDLOOP;
+    const bool acts = side_effects[op] != 0 || op == ARGREF || op_is_call(op) || op_is_intrinsic(op);
+    return static_cast<uint8_t>((assigns ? OP_ASSIGNS : 0) | (writes_left ? OP_WRITES_LEFT : 0) | (acts ? OP_ACTS : 0));
+}
+
 void fill_tables() {
     for (int op = 0; op < NO_OPCODES; ++op) {
         node_operator_name[op] = nullptr;
@@ -59,6 +69,7 @@ void fill_tables() {
         boolean_inv[r.op] = static_cast<uint8_t>(boolean_result[r.op] ? r.negation : ILLOP);
         op_of_opASG[r.op] = static_cast<uint8_t>(r.base);
     }
+    for (int op = 0; op < NO_OPCODES; ++op) op_traits[op] = traits_of(op);
     float_micro_ops_to_op[0] = FLOAT_ALWAYS_FALSE;
     float_micro_ops_to_op[15] = FLOAT_ALWAYS_TRUE;
     for (int op = FEQ; op <= FUNO; ++op) float_micro_ops_to_op[float_op_to_micro_ops[op - FEQ]] = op;
@@ -113,17 +124,6 @@ void init_opcode_tables() {
     }
     check_micro_ops();
     if (print_debug) debug_printf(" *** OPCODE TABLES ARE OK\n\n");
-}
-
-bool opcode_is_ASG(int op) {
-    switch (op) {
-    case ASG:
-    case STASG:
-    case ARASG:
-    case PLUSPLUS:
-    case MINMIN: return true;
-    default: return op >= 0 && op < NO_OPCODES && op_of_opASG[op] != ILLOP;
-    }
 }
 
 const char* opname(int op) {

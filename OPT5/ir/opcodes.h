@@ -26,6 +26,13 @@ extern uint8_t commute_inv[NO_OPCODES];            // the mirror, or ILLOP
 extern bool boolean_result[NO_OPCODES];
 extern uint8_t boolean_inv[NO_OPCODES];            // the logical opposite, or ILLOP
 extern uint8_t op_of_opASG[NO_OPCODES];            // plain operator of a compound assignment, or ILLOP
+// What walks ask of each node, from the tables above: an OP_TRAIT each.
+extern uint8_t op_traits[NO_OPCODES];
+enum OP_TRAIT : uint8_t {
+    OP_ASSIGNS = 1,     // an assignment operator: plain, structure, array and compound, increments included
+    OP_WRITES_LEFT = 2, // gives its left operand a value; a loop's counter is one; no operator of SSA form
+    OP_ACTS = 4,        // may do more than compute a value: writes, calls, transfers control, or what is not known
+};
 
 // A floating compare as a set of outcomes: bit 1 equal, 2 less, 4 greater, 8 unordered. Indexed by op - FEQ.
 constexpr int float_op_to_micro_ops[14] = {1, 6, 3, 2, 5, 4, 9, 14, 11, 10, 13, 12, 7, 8};
@@ -60,8 +67,7 @@ constexpr bool op_is_arithmetic(int op) {
     default: return false;
     }
 }
-// Assignment operators: plain, structure, array and compound, increments included.
-bool opcode_is_ASG(int op);
+inline bool opcode_is_ASG(int op) { return op >= 0 && op < NO_OPCODES && op_traits[op] & OP_ASSIGNS; }
 // A printable name; "OP#n" in a static buffer for a gap.
 const char* opname(int op);
 // The compound assignment whose base operator is `op`, or ILLOP.

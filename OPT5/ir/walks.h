@@ -41,10 +41,7 @@ void for_each_tree(const FUNINFO* f, const F& visit) {
 inline bool op_has_effect(int op) { return side_effects[op] != 0; }
 inline bool op_transfers_control(int op) { return side_effects[op] == 2; }
 // Gives its left operand a value. A loop's counter is one; an operator of SSA form speaks of what stands below it.
-inline bool writes_left_operand(int op) {
-    return (side_effects[op] == 1 && !op_is_SSA(op)) || op == ARASG || op == LOOP ||
-           op == INITLOOP || op == ENDLOOP;
-}
+inline bool writes_left_operand(int op) { return op_traits[op] & OP_WRITES_LEFT; }
 
 // ---- Places: what is written, or has its address taken
 

@@ -27,10 +27,18 @@ inline RANGE both(const RANGE& a, const RANGE& b) {
 WIDE to_wide(INT65 v);
 INT65 to_int65(WIDE v); // of a value in its range
 
-bool has_value_range(const TYPE* t); // an integer or enumeration of 1 to 64 bits; `wchar_t` has no known sign
-bool wraps_signed(const TYPE* t);    // of such a type
+// An integer or enumeration of 1 to 64 bits; `wchar_t` has no known sign.
+inline bool has_value_range(const TYPE* t) {
+    return (t->is_int() || t->is_enum()) && !t->is_wchar() && t->size >= 1 && t->size <= 64;
+}
+inline bool wraps_signed(const TYPE* t) { return !t->is_bool() && !t->is_unsigned(); } // of such a type
 // The values that a variable of the type can have. An enumeration may hold values of either sign.
-RANGE range_of_type(const TYPE* t);
+inline RANGE range_of_type(const TYPE* t) {
+    const WIDE turn = WIDE(1) << t->size;
+    if (t->is_bool()) return {0, 1};
+    if (t->is_enum()) return {-turn / 2, turn - 1};
+    return wraps_signed(t) ? RANGE{-turn / 2, turn / 2 - 1} : RANGE{0, turn - 1};
+}
 // What is left of exact results from `min` to `max` once they are wrapped into the type.
 RANGE wrapped(WIDE min, WIDE max, const TYPE* t);
 RANGE range_of_tree(const NODE* tree, struct LOOP* loop); // of a tree whose type has a range

@@ -18,18 +18,6 @@ WIDE to_wide(INT65 v) {
 }
 INT65 to_int65(WIDE v) { return INT65(static_cast<int32_t>(v >> 64), static_cast<uint64_t>(v)); }
 
-bool has_value_range(const TYPE* t) {
-    return (t->is_int() || t->is_enum()) && !t->is_wchar() && t->size >= 1 && t->size <= 64;
-}
-bool wraps_signed(const TYPE* t) { return !t->is_bool() && !t->is_unsigned(); }
-
-RANGE range_of_type(const TYPE* t) {
-    const WIDE turn = WIDE(1) << t->size;
-    if (t->is_bool()) return {0, 1};
-    if (t->is_enum()) return {-turn / 2, turn - 1};
-    return wraps_signed(t) ? RANGE{-turn / 2, turn / 2 - 1} : RANGE{0, turn - 1};
-}
-
 RANGE wrapped(WIDE min, WIDE max, const TYPE* t) {
     const RANGE limits = range_of_type(t);
     if (limits.min <= min && max <= limits.max) return {min, max};

@@ -17,6 +17,7 @@ constexpr WIDE NO_ROOM = WIDE(1) << 70; // no end of a slice is beyond
 WIDE gcd(WIDE a, WIDE b) {
     if (a < 0) a = -a;
     if (b < 0) b = -b;
+    if (a == 1 || b == 1) return 1;
     while (b) {
         const WIDE r = a % b;
         a = b;
@@ -26,7 +27,10 @@ WIDE gcd(WIDE a, WIDE b) {
 }
 
 // Rounded down and up, for a divisor above 0.
-WIDE floor_div(WIDE a, WIDE b) { return a >= 0 ? a / b : -((-a + b - 1) / b); }
+WIDE floor_div(WIDE a, WIDE b) {
+    if (b == 1) return a; // the step of most slices
+    return a >= 0 ? a / b : -((-a + b - 1) / b);
+}
 WIDE ceil_div(WIDE a, WIDE b) { return -floor_div(-a, b); }
 WIDE floor_mod(WIDE a, WIDE b) { return a - floor_div(a, b) * b; }
 

@@ -16,7 +16,7 @@ struct VPSLICE {
 
     bool is_empty() const { return low > high; }
     bool holds(WIDE v) const {
-        return low <= v && v <= high && (step == 0 || (v - low) % step == 0);
+        return low <= v && v <= high && (step <= 1 || (v - low) % step == 0);
     }
     bool operator==(const VPSLICE& o) const { return low == o.low && high == o.high && step == o.step; }
 };

@@ -221,6 +221,7 @@ static bool nodes_compatible(const TYPE* a, const TYPE* b, TYPE_PAIRS& pairs) {
 bool compatible_types(const TYPE* a, const TYPE* b, bool strict) {
     if (!a || !b) return a == b;
     if (!a->frozen || !b->frozen) return false;
+    if (same_type(a, b)) return true;
     TYPE_PAIRS pairs;
     pairs.add(a, b);
     while (!pairs.empty()) {

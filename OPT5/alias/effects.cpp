@@ -316,6 +316,13 @@ bool ACCESS_LISTS::act_may_touch(const ACT& act, size_t from, const COMPARED_LVA
     return false;
 }
 
+bool ACCESS_LISTS::act_may_modify(const ACT& act, size_t from, const COMPARED_LVALUE& lvalue) const {
+    if (!writes_left_operand(act.node->op) || !act.node->left) return node_may_modify(act.node, lvalue);
+    for (size_t i = from; i < act.places_end; ++i)
+        if (lvalues_may_be_aliased(places[i], lvalue)) return true;
+    return false;
+}
+
 bool ACCESS_LISTS::touches(size_t number, const COMPARED_LVALUE& lvalue) const {
     const RANGE& r = trees[number];
     for (size_t i = r.acts, place = r.places; i < r.acts_end; place = acts[i++].places_end)
@@ -327,8 +334,8 @@ bool ACCESS_LISTS::touches(size_t number, const COMPARED_LVALUE& lvalue) const {
     if (r.acts != r.acts_end && any_lvalue_read(t, [&](const NODE* part) {
             if (part == t) return false;
             const COMPARED_LVALUE of_part(part);
-            for (size_t i = r.acts; i < r.acts_end; ++i)
-                if (node_may_modify(acts[i].node, of_part)) return true;
+            for (size_t i = r.acts, place = r.places; i < r.acts_end; place = acts[i++].places_end)
+                if (act_may_modify(acts[i], place, of_part)) return true;
             return false;
         }))
         return true;

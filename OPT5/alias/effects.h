@@ -118,6 +118,7 @@ private:
         size_t acts, acts_end, places, reads, reads_end;
     };
     bool act_may_touch(const ACT& act, size_t places, const COMPARED_LVALUE& lvalue) const;
+    bool act_may_modify(const ACT& act, size_t places, const COMPARED_LVALUE& lvalue) const;
 
     std::vector<ACT> acts;              // of each tree: the nodes that act
     std::deque<COMPARED_LVALUE> places; // of each tree: those that they write, then the lvalues it reads

@@ -618,7 +618,7 @@ enum SWEEP : uint8_t { DONE, LOADS_CHANGED, STORES_CHANGED };
 
 // Stores are looked at in the form that the loads have left alone, since they go by what is still read.
 SWEEP sweep(PROMOTION_TEMPS& temps, bool with_assertions, bool is_second) {
-    construct_SSA_form(false, false, false);
+    construct_SSA_form(false, false, false, true);
     if (!function_is_in_SSA_form) return DONE;
     SWEEP result = DONE;
     {

@@ -83,9 +83,9 @@ public:
 // ---- The form of the current function
 
 // `onlySSV`: local scalars alone; `onlyIV`: whole integers, pointers and floating-point variables alone; `vectorsToo`:
-// also vectors. Blocks are numbered afterwards, alias marks and dominators are known. Where nothing is tracked, or too
+// also vectors; `onlyMemory`: not the local scalars that a register holds, whose references stay as they are. Blocks are numbered afterwards, alias marks and dominators are known. Where nothing is tracked, or too
 // much, the function stays out of the form.
-void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo);
+void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo, bool onlyMemory = false);
 void deconstruct_SSA_form(); // no effect out of the form
 extern bool function_is_in_SSA_form;
 

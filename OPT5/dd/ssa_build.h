@@ -21,10 +21,12 @@ struct SSA_SITE {
 };
 
 struct SSA_BUILD {
-    bool onlySSV = false, onlyIV = false, vectorsToo = false;
+    bool onlySSV = false, onlyIV = false, vectorsToo = false, onlyMemory = false;
+    size_t left_bare = 0; // references to registers that are not tracked
     std::vector<SSA_SITE> sites;
     std::vector<size_t> first_site; // by the number of the block, which is what ends the sites of the block before it
     std::vector<BBLK*> blocks;      // by number from 1
+    int64_t references() const { return static_cast<int64_t>(sites.size() + left_bare); }
 };
 
 struct SSA_STATE {
@@ -45,6 +47,8 @@ struct SSA_PLACE {
 };
 // False where the tree does not show a fixed place.
 bool find_SSA_place(const NODE* lvalue, SSA_PLACE* place);
+// Of a local scalar as a whole, which could be tracked, and nothing but its name reaches: a SSAVAR_likely_register's.
+bool is_register_reference(const NODE* lvalue, const SSA_BUILD& build);
 // The entry of a reference, made if there is none; null for one that is not tracked.
 SSAVAR* SSAVAR_for_reference(const NODE* lvalue, const SSA_BUILD& build);
 SSAVAR* find_SSAVAR_ring(const SYMTAB* sym);         // the entries of an object, or null

@@ -162,9 +162,8 @@ private:
     REUSED_LISTS<int>&live_in = build_lists.live_in, &definers = build_lists.definers;
     REUSED_LISTS<uint32_t>& live_at_entry = build_lists.live_at_entry;
     REUSED_LISTS<NODE*>& phis = build_lists.phis;
-    int64_t definitions_left = MOST_SSA_DEFINITIONS + 4 * static_cast<int64_t>(build.sites.size()); // chis and phis
-    int64_t live_left =
-        8 * MOST_SSA_DEFINITIONS + 32 * static_cast<int64_t>(build.sites.size()); // entries of live sets
+    int64_t definitions_left = MOST_SSA_DEFINITIONS + 4 * build.references(); // chis and phis
+    int64_t live_left = 8 * MOST_SSA_DEFINITIONS + 32 * build.references(); // entries of live sets
     // Numbers of the predecessors, which are walked for each variable: those of block b from `first_before[b]` on.
     std::vector<int> before_blocks;
     std::vector<size_t> first_before;
@@ -420,7 +419,7 @@ void BUILDER::rename() {
 
 } // namespace
 
-void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo) {
+void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo, bool onlyMemory) {
     OPT_ASSERT(!function_is_in_SSA_form);
     if (print_debug) {
         if (onlySSV) debug_printf("We consider only SSV candidates for SSA form.\n");
@@ -436,6 +435,7 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo) {
     build.onlySSV = onlySSV;
     build.onlyIV = onlyIV;
     build.vectorsToo = vectorsToo;
+    build.onlyMemory = onlyMemory;
     ssa_state.definitions.assign(1, {});
     wrap_SSA_references(build);
     function_is_in_SSA_form = true;

@@ -55,6 +55,11 @@ private:
     void assignment(NODE** link);
     void write_within(NODE** link);
     void note_untracked(const NODE* lvalue);
+    bool is_left_bare(const NODE* lvalue) {
+        const bool is_bare = build.onlyMemory && is_register_reference(lvalue, build);
+        build.left_bare += is_bare;
+        return is_bare;
+    }
     void site(SSA_SITE::KIND kind, NODE** link, NODE* node) { build.sites.push_back({kind, link, node}); }
 
     SSA_BUILD& build;
@@ -89,6 +94,7 @@ void WRAPPER::operands_of_place(NODE** link) {
 
 void WRAPPER::access(NODE** link) {
     NODE* t = *link;
+    if (is_left_bare(t)) return;
     SSAVAR* v = SSAVAR_for_reference(t, build);
     NODE** base = link_without_members(link);
     if (is_access((*base)->op))
@@ -140,6 +146,10 @@ void WRAPPER::assignment(NODE** link) {
     NODE* t = *link;
     const bool reads = t->op != ASG && t->op != STASG && t->op != ARASG;
     if (t->right) value(&t->right);
+    if (is_left_bare(t->left)) {
+        if (t->left->type->is_pointer()) site(SSA_SITE::WRITE, link, t); // what is behind it is another place then
+        return;
+    }
     SSAVAR* v = is_access(t->left->op) ? SSAVAR_for_reference(t->left, build) : nullptr;
     operands_of_place(&t->left);
     if (!v) {
@@ -211,7 +221,7 @@ void wrap_SSA_references(SSA_BUILD& build) {
 SSA_CHANGES::SSA_CHANGES(const SSA_BUILD& build)
     : stamp(ssa_state.variables.size(), 0),
       // Beyond that every answer is "may": time stays linear.
-      questions_left(100000 + 64 * static_cast<int64_t>(build.sites.size())) {}
+      questions_left(100000 + 64 * build.references()) {}
 
 void SSA_CHANGES::add(SSAVAR* v) {
     if (stamp[v->uid] == now) return;

@@ -123,6 +123,14 @@ bool find_SSA_place(const NODE* t, SSA_PLACE* place) {
            place->start + place->length <= INT65(static_cast<int64_t>(place->sym->size));
 }
 
+bool is_register_reference(const NODE* t, const SSA_BUILD& build) {
+    const NODE* name = name_accessed(t);
+    const SYMTAB* sym = name ? name->u.sym : nullptr;
+    return sym && sym->is_automatic() && sym->type->is_scalar() && t->type->is_scalar() && t->type->size == sym->size &&
+           t->type->size > 0 && has_tracked_type(t->type, build) && is_tracked_object(sym) && !lvalue_is_volatile(t) &&
+           !may_be_reached_by_pointers(sym);
+}
+
 SSAVAR* SSAVAR_for_reference(const NODE* lvalue, const SSA_BUILD& build) {
     SSA_PLACE place;
     if (!has_tracked_type(lvalue->type, build) || lvalue_is_volatile(lvalue) || !find_SSA_place(lvalue, &place))

@@ -342,7 +342,9 @@ bool is_chosen_place(const NODE* t) { return t->op == UMULT && is_strict_ternary
 
 NODE* simp_tree(NODE* tree, struct LOOP* loop) {
     if (!tree) return tree;
-    std::vector<PLACE> open{{&tree, false, false}};
+    std::vector<PLACE> open;
+    open.reserve(16); // what most trees take
+    open.push_back({&tree, false, false});
     while (!open.empty()) {
         PLACE& place = open.back();
         NODE* t = *place.link;

@@ -91,6 +91,8 @@ SYMTAB* single_pointsto_target_if_known(const PTENV* e);
 // A fresh tree, of the pointer's type, for the value of a pointer at the block's end where that is one place in a global, or
 // null.
 NODE* find_var_init_in_PT_info(SYMTAB* pointer, const BBLK* bb);
+// What holds of a pointer variable whenever the block begins; null where nothing is known.
+const PTENV* PT_info_at_start(const SYMTAB* pointer, const BBLK* bb);
 // Whether two accesses, in any two executions in one activation, may touch. The forms are those of the accesses.
 bool UMULT_PT_targets_may_overlap(const NODE* a, const ADDRESS_FORM& x, const NODE* b, const ADDRESS_FORM& y);
 void dump_ptr_PT_binding(const SYMTAB* pointer, const PTENV* e); // to the debug stream

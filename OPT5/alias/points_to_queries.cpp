@@ -87,6 +87,11 @@ NODE* find_var_init_in_PT_info(SYMTAB* pointer, const BBLK* bb) {
     return coerce_to_type(pointer->type->stqs(), offset ? maketree(PLUS, address, mk_ICON(INT65(offset), type), type) : address);
 }
 
+const PTENV* PT_info_at_start(const SYMTAB* pointer, const BBLK* bb) {
+    const PT_STORE* store = PT_store();
+    return store ? store->binding(pointer, store->into[bb]) : nullptr;
+}
+
 // ---- Pairs
 
 namespace {

@@ -305,6 +305,7 @@ void build_loop_hierarchy(bool full, bool scalars, bool simplify, int requireLoo
     if (full) {
         if (loop_work.propagate_values) loop_work.propagate_values();
         find_loop_assertions(nullptr);
+        if (opt_level() >= 3) assert_pointer_alignments();
     }
     maybe_clear_restrict_in_inner_loops();
     if (full && unsigned_index_wraps) insert_affine_marks(loop_root());

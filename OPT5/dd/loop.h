@@ -314,6 +314,7 @@ void prop_IVs_and_RCs_in_loop(struct LOOP* loop, bool recurse);
 // ---- loop_assertions.cpp
 void install_loop_callbacks();                // once: what the rooms below ask of loops is answered here
 void find_loop_assertions(struct LOOP* loop); // and those in it; null: from the root
+void assert_pointer_alignments(); // of the pointers that loops keep, from what they may refer to
 void find_loop_assertions_for_loop(struct LOOP* loop);
 // Both consume the tree, which holds on entry to, or throughout, the loop; null loop: it is erased.
 void add_loop_entry_assertion(NODE* tree, struct LOOP* loop);

@@ -17,6 +17,7 @@
 
 #include "IFILE/pragma.h"
 #include "OPT5/alias/effects.h"
+#include "OPT5/alias/points_to.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/loop_callbacks.h"
 #include "OPT5/ir/statements.h"
@@ -25,6 +26,8 @@
 #include "OPT5/scalar/implied_tests.h"
 #include "OPT5/simp/simp.h"
 #include "OPT5/target/bif.h"
+
+#include <set>
 
 // ---- Callbacks
 
@@ -463,4 +466,39 @@ void find_loop_assertions(struct LOOP* loop) {
     if (!loop) loop = loop_root();
     if (!loop) return;
     for (struct LOOP* l : loops_outer_first(loop)) find_loop_assertions_for_loop(l);
+}
+
+// ---- Alignment of pointers
+
+static struct LOOP* outermost_loop_that_keeps(const SYMTAB* s, struct LOOP* loop) {
+    struct LOOP* outermost = nullptr;
+    for (; loop && !loop->is_root() && sym_is_RC_in_loop(s, loop); loop = loop->parent) outermost = loop;
+    return outermost;
+}
+
+// `e` is what holds of the pointer where the outermost of the loops begins that keep it.
+static void insert_PT_alignment_assertion_in_loop(const PTENV* e, SYMTAB* s, struct LOOP* loop) {
+    struct LOOP* outermost = outermost_loop_that_keeps(s, loop);
+    const unsigned align = overall_PT_align(e), plain = std::max(16u, s->type->type_pointed_to()->align);
+    if (!outermost || !e || align <= plain) return;
+    TYPE* type = tp->long_t;
+    NODE* rest = maketree(MOD, coerce_to_type(type, mk_NAME(s)), mk_ICON(INT65(align >> 4), type), type);
+    NODE* fact = maketree(EQ, rest, mk_ICON(INT65(0), type), tp->int_t);
+    if (print_debug) debug_printf("--> Attempting to assert %s\n", tree_to_infix(fact).c_str());
+    add_loop_entry_assertion(fact, outermost);
+}
+
+void assert_pointer_alignments() {
+    need(fact::points_to);
+    std::set<std::pair<const SYMTAB*, const struct LOOP*>> seen; // membership only
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        if (!bb->loop || bb->loop->is_root()) continue;
+        for (const LIST* l = bb->statements; l; l = l->rest)
+            for_each_subtree(l->first, [&](NODE* t) {
+                if (t->op != NAME || !t->u.sym || !t->u.sym->type->is_pointer()) return;
+                struct LOOP* outermost = outermost_loop_that_keeps(t->u.sym, bb->loop);
+                if (!outermost || !seen.insert({t->u.sym, outermost}).second) return;
+                insert_PT_alignment_assertion_in_loop(PT_info_at_start(t->u.sym, outermost->head), t->u.sym, bb->loop);
+            });
+    }
 }

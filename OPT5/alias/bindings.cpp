@@ -64,6 +64,7 @@ uint32_t class_category(const SYMTAB* base) {
 }
 
 PTVAR make_target(SYMTAB* base, int64_t offset, int64_t stride) {
+    OPT_ASSERT(base != NULL);
     reduce(offset, stride);
     return {base, offset, stride, target_align(base, offset, stride)};
 }

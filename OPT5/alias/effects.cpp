@@ -209,6 +209,15 @@ bool tree_changes_nothing(const NODE* tree) {
     });
 }
 
+std::vector<const NODE*> lvalues_read_in(const NODE* tree) {
+    std::vector<const NODE*> lvalues;
+    any_lvalue_read(tree, [&lvalues](const NODE* t) {
+        lvalues.push_back(t);
+        return false;
+    });
+    return lvalues;
+}
+
 const void* computing_callee(const NODE* call, bool* reads_memory) {
     *reads_memory = false;
     if (!call->type->is_scalar()) return nullptr;

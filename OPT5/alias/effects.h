@@ -91,6 +91,9 @@ const void* pure_callee(const NODE* call);
 // The same of a callee that may read memory also, as `*reads_memory` tells then.
 const void* computing_callee(const NODE* call, bool* reads_memory);
 
+// The outermost lvalues that a tree reads, and those that their addresses are computed from.
+std::vector<const NODE*> lvalues_read_in(const NODE* tree);
+
 // ---- Changes
 
 // Whether evaluating `a` may change what `t` reads: the objects, and the addresses it reads them by.

@@ -38,7 +38,7 @@ private:
         bool is_reached = false, is_waiting = false;
         int visits = 0;
     };
-    void enter(SYMTAB* sym);
+    void enter(SYMTAB* ptr);
     void find_pointers();
     PT_STATE at_function_entry();
     PT_STATE joined(const BLOCK& b) const;
@@ -58,10 +58,11 @@ bool is_kept_track_of(const SYMTAB* sym) {
            !(sym->cqual & CQ_GLOBAL_REGISTER) && !sym_appears_in_EHT(sym);
 }
 
-void PROPAGATION::enter(SYMTAB* sym) {
-    if (!is_kept_track_of(sym) || store.pointers.size() == MOST_POINTERS) return;
-    if (store.numbers.emplace(sym, static_cast<unsigned>(store.pointers.size())).second)
-        store.pointers.push_back({sym, only_its_name_reaches(sym)});
+void PROPAGATION::enter(SYMTAB* ptr) {
+    OPT_ASSERT(ptr != NULL);
+    if (!is_kept_track_of(ptr) || store.pointers.size() == MOST_POINTERS) return;
+    if (store.numbers.emplace(ptr, static_cast<unsigned>(store.pointers.size())).second)
+        store.pointers.push_back({ptr, only_its_name_reaches(ptr)});
 }
 
 void PROPAGATION::find_pointers() {
@@ -212,9 +213,11 @@ bool bindings_still_hold() {
     });
 }
 
+void clear_PT_vectors() { currfuninfo->points_to.reset(); }
+
 const FACT_FINDER finder("what pointers may refer to", fact::points_to,
-                         fact::alias_marks | fact::pointees | fact::block_numbers, find_points_to,
-                         [] { currfuninfo->points_to.reset(); }, bindings_still_hold);
+                         fact::alias_marks | fact::pointees | fact::block_numbers, find_points_to, clear_PT_vectors,
+                         bindings_still_hold);
 
 } // namespace
 

@@ -75,11 +75,13 @@ struct FUNCTION {
     // The first change of the expression in a block ahead of the position, or the last; 0: there is none.
     int first_change(const TRIPLE& t, int block, bool with_memory);
     int last_change(const TRIPLE& t, int block, bool with_memory, int before = INT32_MAX);
+    // By the statements of the block from the one position to ahead of the other.
+    bool tree_is_unaltered(const TRIPLE& t, int block, int from, int before) {
+        return last_change(t, block, t.reads_memory, before) < from;
+    }
 
 private:
-    bool changes_it(const TRIPLE_WRITE& w, const TRIPLE& t) {
-        return --questions_left < 0 || tree_modifies_lvalue_in_tree(w.statement, t.tree);
-    }
+    bool changes_it(const TRIPLE_WRITE& w, const TRIPLE& t);
 };
 
 class EXPRESSION {
@@ -126,6 +128,14 @@ std::pair<const TRIPLE_WRITE*, const TRIPLE_WRITE*> in_block(const std::vector<T
     const TRIPLE_WRITE *begin = writes.data(), *end = begin + writes.size();
     begin = std::lower_bound(begin, end, block, [](const TRIPLE_WRITE& w, int b) { return w.block < b; });
     return {begin, std::upper_bound(begin, end, block, [](int b, const TRIPLE_WRITE& w) { return b < w.block; })};
+}
+
+bool FUNCTION::changes_it(const TRIPLE_WRITE& w, const TRIPLE& t) {
+    const auto write = static_cast<size_t>(&w - writes_of_memory().data());
+    for (size_t lvalue : t.lvalues)
+        if (!triples_alias_table.was_asked(lvalue, write)) --questions_left;
+    if (t.is_asked_whole) --questions_left;
+    return questions_left < 0 || write_may_alter(t, w);
 }
 
 int FUNCTION::first_change(const TRIPLE& t, int block, bool with_memory) {
@@ -220,12 +230,12 @@ bool EXPRESSION::renews(const TRIPLE_RENEWAL& r) const {
     const BBLK* bb = r.bb;
     int before = r.position;
     for (int n = 0; n < MOST_BLOCKS; ++n, before = INT32_MAX) {
-        const int changed = function.last_change(other, bb->dfn, other.reads_memory, before);
         const TRIPLE_SITE* last = nullptr;
         for (const TRIPLE_SITE& s : other.sites)
             if (s.block == bb->dfn && s.position <= before && s.is_certain && function.stands(s)) last = &s;
-        if (last) return last->position > changed;
-        if (changed || !bb->predecessors || bb->predecessors->rest) return false;
+        if (!function.tree_is_unaltered(other, bb->dfn, last ? last->position : 1, before)) return false;
+        if (last) return true;
+        if ( !bb->predecessors || bb->predecessors->rest) return false;
         bb = bb->predecessors->first;
     }
     return false;
@@ -528,7 +538,8 @@ bool GLOBAL_CSE::is_induction(const TRIPLE& t) const {
 
 void GLOBAL_CSE::apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>& insertions) {
     const TRIPLE& t = e.t;
-    SYMTAB* temp = sym_temp('U', -1, t.tree->type->stqs(), t.tree->ls);
+    const char letter = op_is_call(t.tree->op) ? 'K' : 'U'; // what a call gave, or else
+    SYMTAB* temp = sym_temp(letter, -1, t.tree->type->stqs(), t.tree->ls);
     const std::string text = print_debug ? tree_to_infix(t.tree) : std::string();
     auto name = [temp](const NODE* like) { return coerce_to_type(like->type->stqs(), mk_NAME(temp, like->ls)); };
     for (const BATCH::EDGE_PLACE& p : insertions) {

@@ -103,6 +103,7 @@ void insert_statements_ahead(BBLK* bb, STATEMENTS_AHEAD& ahead) {
 }
 
 std::vector<TRIPLE> unique_triples;
+Triple_Alias_Table triples_alias_table;
 
 namespace {
 
@@ -299,13 +300,21 @@ TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
     for_each_subtree(tree, [&t](const NODE* n) {
         if (n->op == DIV || n->op == MOD || n->op == CALL || n->op == ICALL) t.may_trap = true;
         if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
-        if (n->op == CALL && !pure_callee(n)) t.reads_memory = true;
+        if (n->op == CALL && !pure_callee(n)) t.reads_memory = t.is_asked_whole = true;
         if (n->op != NAME || !n->u.sym || n->u.sym->is_function()) return;
         if (!only_its_name_reaches(n->u.sym)) // an address of it costs nothing to ask about
             t.reads_memory = true;
         else if (std::find(t.variables.begin(), t.variables.end(), n->u.sym) == t.variables.end())
             t.variables.push_back(n->u.sym);
     });
+    if (t.reads_memory)
+        for (const NODE* n : lvalues_read_in(tree)) {
+            const int of_lvalue = this->number(n).number;
+            if (of_lvalue == NO_TRIPLE)
+                t.is_asked_whole = true;
+            else if (!is_private_name(n))
+                t.lvalues.push_back(triples_alias_table.number_of(of_lvalue, n));
+        }
     unique_triples.push_back(std::move(t));
     return unique_triples.back();
 }
@@ -372,6 +381,40 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
 
 } // namespace
 
+// ---- Aliases
+
+size_t Triple_Alias_Table::number_of(int triple, const NODE* lvalue) {
+    if (rows.empty() && print_debug >= 3) debug_printf(" Building triples_alias_table\n");
+    const auto [at, is_new] = numbers.try_emplace(triple, rows.size());
+    if (is_new) rows.push_back({lvalue, BITVEC(), BITVEC()});
+    return at->second;
+}
+
+bool Triple_Alias_Table::may_be_altered(size_t lvalue, size_t write) {
+    ROW& row = rows[lvalue];
+    const auto bit = static_cast<uint32_t>(write);
+    if (row.asked.test(bit)) return row.altered.test(bit);
+    if (!row.asked.bits) row.asked = row.altered = BITVEC(static_cast<uint32_t>(memory_writes.size()));
+    row.asked.set(bit);
+    const NODE* statement = memory_writes[write].statement;
+    const bool may = tree_modifies_lvalue(statement, row.lvalue);
+    if (may) row.altered.set(bit);
+    if (print_debug >= 3) {
+        const std::string text = tree_to_infix(row.lvalue);
+        debug_printf(" --- alias test: %s and", stmt2infix(statement).c_str());
+        debug_printf(" to %s ", text.c_str());
+        debug_printf(may ? " MAY be aliased\n" : " NOT aliased\n");
+        // (1): it is stored to by the statement itself; (2): by what that calls.
+        if (may) debug_printf(statement->op == ASG ? " +++ alias test (1): add %s \n" : " +++ alias test (2): add %s \n", text.c_str());
+    }
+    return may;
+}
+
+void Triple_Alias_Table::clear() {
+    numbers.clear();
+    std::vector<ROW>().swap(rows);
+}
+
 const std::vector<TRIPLE_WRITE>& writes_of_variable(const SYMTAB* sym) {
     static const std::vector<TRIPLE_WRITE> none;
     auto at = variable_writes.find(sym);
@@ -380,18 +423,64 @@ const std::vector<TRIPLE_WRITE>& writes_of_variable(const SYMTAB* sym) {
 const std::vector<TRIPLE_WRITE>& writes_of_memory() { return memory_writes; }
 const std::vector<TRIPLE_WRITE>& statements_that_may_stay() { return staying; }
 
+bool write_may_alter(const TRIPLE& t, const TRIPLE_WRITE& w) {
+    const auto write = static_cast<size_t>(&w - memory_writes.data());
+    return std::any_of(t.lvalues.begin(), t.lvalues.end(),
+                       [write](size_t lvalue) { return triples_alias_table.may_be_altered(lvalue, write); }) ||
+           (t.is_asked_whole && tree_modifies_lvalue_in_tree(w.statement, t.tree));
+}
+
+// ---- Dumps
+
+// Adds the triples that a statement of the block may alter.
+static void mark_altered_triples(const BBLK* bb, BITVEC* set) {
+    auto is_of_block = [bb](const TRIPLE_WRITE& w) { return w.block == bb->dfn; };
+    for (size_t i = 0; i < unique_triples.size(); ++i) {
+        const TRIPLE& t = unique_triples[i];
+        bool is_altered = false;
+        for (const SYMTAB* sym : t.variables) {
+            const std::vector<TRIPLE_WRITE>& writes = writes_of_variable(sym);
+            is_altered |= std::any_of(writes.begin(), writes.end(), is_of_block);
+        }
+        for (const TRIPLE_WRITE& w : memory_writes)
+            if (!is_altered && is_of_block(w)) is_altered = write_may_alter(t, w);
+        if (is_altered) {
+            debug_printf(" Altered! %ld\n", static_cast<long>(i));
+            set->set(static_cast<uint32_t>(i));
+        } else {
+            debug_printf(" NOT marked (not altered)\n");
+        }
+    }
+}
+
+static void dump_altered() {
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        BITVEC altered(static_cast<uint32_t>(unique_triples.size()));
+        mark_altered_triples(bb, &altered);
+        debug_printf(" ALTERED SET bb(%d):\n", bb->dfn);
+        for (uint32_t i = altered.next_set(0); i < altered.bits; i = altered.next_set(i + 1))
+            debug_printf("   ALTERED:\t%s\n", tree_to_infix(unique_triples[i].tree).c_str());
+    }
+}
+
 void annotate_cfg() {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'annotate_cfg' ----------\n");
     clean_up_gdflow_bitvecs();
     need(fact::alias | fact::block_numbers | fact::points_to);
     ANNOTATOR().run();
     if (!print_debug) return;
-    for (size_t i = 0; i < unique_triples.size(); ++i)
-        debug_printf("\tTriple <%d>:\t----    %s\n", static_cast<int>(i), tree_to_infix(unique_triples[i].tree).c_str());
+    for (size_t i = 0; i < unique_triples.size(); ++i) {
+        const std::string text = tree_to_infix(unique_triples[i].tree);
+        debug_printf("\tTriple <%d>:\t----    %s\n", static_cast<int>(i), text.c_str());
+        if (print_debug >= 3)
+            debug_printf("\tBucket[%d] holds triple <%ld>:\t%s\n", unique_triples[i].tree->op, static_cast<long>(i), text.c_str());
+    }
+    if (print_debug >= 3) dump_altered();
 }
 
 void clean_up_gdflow_bitvecs() {
     std::vector<TRIPLE>().swap(unique_triples);
+    triples_alias_table.clear();
     variable_writes.clear();
     std::vector<TRIPLE_WRITE>().swap(memory_writes);
     std::vector<TRIPLE_WRITE>().swap(staying);

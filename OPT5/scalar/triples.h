@@ -1,6 +1,7 @@
 // Expressions by number: what passes on common subexpressions of a block and of a function share.
 #pragma once
 
+#include "BITVEC/bitvec.h"
 #include "OPT5/ir/list.h"
 #include "OPT5/ir/node.h"
 
@@ -76,7 +77,9 @@ struct TRIPLE {
     double cost = 0;
     bool may_trap = false; // a division, a load through a pointer, or a call
     bool reads_memory = false;
+    bool is_asked_whole = false; // a call in it reads memory: the table does not tell what alters that
     std::vector<const SYMTAB*> variables; // private ones that it reads
+    std::vector<size_t> lvalues;          // other ones, by their numbers in the table of aliases
     std::vector<TRIPLE_SITE> sites;       // in the order of blocks and statements
     std::vector<TRIPLE_RENEWAL> renewals; // likewise
 };
@@ -89,8 +92,28 @@ struct TRIPLE_WRITE {
 };
 
 extern std::vector<TRIPLE> unique_triples;
+
+// For each lvalue that triples read, which of the writes to memory may alter it: asked once, when it is wanted first.
+class Triple_Alias_Table {
+public:
+    size_t number_of(int triple, const NODE* lvalue); // of the lvalue whose tree has this number; borrowed
+    bool was_asked(size_t lvalue, size_t write) const { return rows[lvalue].asked.test(static_cast<uint32_t>(write)); }
+    bool may_be_altered(size_t lvalue, size_t write);
+    void clear();
+
+private:
+    struct ROW {
+        const NODE* lvalue;
+        BITVEC asked, altered; // by the number of the write
+    };
+    std::unordered_map<int, size_t> numbers; // looked up, never walked
+    std::vector<ROW> rows;
+};
+extern Triple_Alias_Table triples_alias_table;
 // The writes of a private variable, and those of everything else, in order.
 const std::vector<TRIPLE_WRITE>& writes_of_variable(const SYMTAB* sym);
 const std::vector<TRIPLE_WRITE>& writes_of_memory();
+// Whether one of those of memory may change what the triple reads there.
+bool write_may_alter(const TRIPLE& t, const TRIPLE_WRITE& w);
 // Statements that may not pass control on: what may trap does not move ahead of them.
 const std::vector<TRIPLE_WRITE>& statements_that_may_stay();

@@ -147,7 +147,7 @@ int critical_edges(int a, int b, int c) {
 int weight(int x) { return x * x % 11 + cell * x; }
 // FUNCTION: heaviest
 // COUNT 2: _weight(
-// HAS: /U\d+ = \$O\$N\d+$/
+// HAS: /K\d+ = \$O\$N\d+$/
 int heaviest(int n) {
     int i, best = 0;
     for (i = 1; i < n; i++)

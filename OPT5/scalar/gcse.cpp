@@ -641,5 +641,3 @@ void gcse() {
     need(fact::loops);
     GLOBAL_CSE().run();
 }
-
-void restructure_loops() {}

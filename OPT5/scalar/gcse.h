@@ -3,5 +3,5 @@
 
 void gcse();
 
-// Needs the sets of `annotate_cfg`.
+// Loops of one iteration, and empty ones (restructure.cpp).
 void restructure_loops();

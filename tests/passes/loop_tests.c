@@ -73,11 +73,35 @@ int long_tail(const int *p, int n) {
     return a * 3 + b;
 }
 
+// A loop of one iteration is none, and one that computes nothing that is read goes.
+// FUNCTION: nothing_left
+// COUNT 0: goto
+int nothing_left(int n, const int *p) {
+    int i, j, s = 0;
+    for (j = 0; j < 10; j++) s += j;
+    for (i = 3; i < 4; i++) g[i] += p[i] * n;
+    for (i = 10, j = 3; i > 0; i -= 2) j ^= i * n;
+    return n;
+}
+
+// Not where what it has counted, or found, is read, and where it may wait for good.
+volatile int ticks;
+int waits(int n, const int *p) {
+    int i, k = 0, s = 0, last = 0;
+    for (i = 0; i < n; i++) {}
+    for (k = 0; k < 7; k++) last = k ^ n;
+    for (k = 0; k < 5; k++) s += ticks;
+    while (p != &g[n]) p++;
+    for (k = 0; k < 1; k++) { if (n > 3) break; s += 5; }
+    return i * 100 + last + s + (p == &g[n]);
+}
+
 int main(void) {
     put_i16(in_turn(4) + in_turn(0));
     for (int i = 0; i < 8; i++) g[i] = i * i;
     for (int n = -1; n < 7; n += 2) put_i16(nested(n));
     static const int x[8] = {3, 9, -4, 2, 7, 7, -1, 5};
+    for (int n = 0; n < 7; n += 2) put_i16(nothing_left(n, x) + waits(n, g) + g[3]);
     put_i16(arms(x, 5) + long_tail(x, 4));
     return 0;
 }

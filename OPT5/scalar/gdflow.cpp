@@ -156,6 +156,9 @@ private:
     }
     void find_renewals();
     void find_renewals_of(TRIPLE& t);
+    static TREE_KEY shape_of(const TRIPLE& t, double more_cost) {
+        return {t.tree->op, type_code(t.tree->type), static_cast<uint64_t>((t.cost + more_cost) * 2), 0, 0};
+    }
     TRIPLE& triple_of(int number, const NODE* t, double cost);
 
     std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> numbers; // looked up, never walked
@@ -165,11 +168,13 @@ private:
     struct ASSIGNMENT {
         TRIPLE_RENEWAL place;
         int value; // the number of what is assigned
+        double cost;
     };
     std::unordered_map<const SYMTAB*, std::vector<ASSIGNMENT>> assignments; // looked up, never walked
     // A variable that counts as its value has the number, and trees without a number get none, while this is set.
     const SYMTAB* replaced = nullptr;
     int replaced_by = NO_TRIPLE;
+    std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> shapes; // how many triples have one operator, type and cost
     BBLK* block = nullptr;
     LIST* cell = nullptr;
     int position = 0;
@@ -271,6 +276,9 @@ void ANNOTATOR::find_renewals_of(TRIPLE& t) {
         auto at = assignments.find(x);
         if (at == assignments.end()) continue;
         for (size_t i = 0; i < std::min(at->second.size(), MOST_RENEWALS); ++i) {
+            const double more_cost = at->second[i].cost; // of what the variable stands for, once
+            auto like = shapes.find(shape_of(t, more_cost));
+            if (like == shapes.end() || like->second <= (more_cost == 0 ? 1 : 0)) continue;
             replaced = x;
             replaced_by = at->second[i].value;
             const KNOWN other = find(t.tree);
@@ -287,6 +295,9 @@ void ANNOTATOR::find_renewals_of(TRIPLE& t) {
 }
 
 void ANNOTATOR::find_renewals() {
+    if (assignments.empty()) return;
+    for (const TRIPLE& t : unique_triples)
+        if (t.cost >= LEAST_COST_TO_RENEW) ++shapes[shape_of(t, 0)];
     for (TRIPLE& t : unique_triples)
         if (t.cost >= LEAST_COST_TO_RENEW) find_renewals_of(t);
 }
@@ -373,7 +384,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
         if (assigns_variable(t)) {
             const KNOWN value = number(t->right);
             if (value.number != NO_TRIPLE)
-                assignments[t->left->u.sym].push_back({{bb->dfn, at, s, bb, 0}, value.number});
+                assignments[t->left->u.sym].push_back({{bb->dfn, at, s, bb, 0}, value.number, value.cost});
         }
         read_place(t->left, true);
     }

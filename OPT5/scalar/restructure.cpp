@@ -22,8 +22,8 @@
 #include "OPT5/scalar/subrange.h"
 #include "OPT5/scalar/triples.h"
 
+#include <algorithm>
 #include <cstdlib>
-#include <unordered_set>
 
 namespace {
 
@@ -69,23 +69,21 @@ long most_iterations(const BBLK* entry) {
 }
 
 bool is_essentially_empty(const PLAIN_LOOP& loop) {
-    std::unordered_set<const SYMTAB*> written; // membership, and a question that all must pass
+    std::vector<const NODE*> written;
     for (const BBLK* bb : loop.blocks)
         for (const LIST* s = bb->statements; s; s = s->rest) {
             const NODE* t = s->first;
             if (t->op == BRANCH) continue;
             if (t->op == IF && !tree_has_side_effects(t->left)) continue;
             const bool assigns = t->op == ASG || is_operator_assignment(t);
-            if (!assigns || !is_private_name(t->left) || tree_has_side_effects(t->right)) return false;
-            written.insert(t->left->u.sym);
+            if (!assigns || t->left->op != NAME || tree_has_side_effects(t->right)) return false;
+            written.push_back(t->left);
         }
-    need(fact::live_variables);
-    if (!live_at_entry_is_known(loop.exit)) return false;
-    for (const SYMTAB* sym : written) {
-        const int bit = live_index(sym);
-        if (bit < 0 || is_live_at_entry(loop.exit, bit)) return false;
-    }
-    return true;
+    need(fact::alias_marks | fact::live_variables);
+    return live_at_entry_is_known(loop.exit) && std::all_of(written.begin(), written.end(), [&loop](const NODE* name) {
+        const int bit = is_private_name(name) ? live_index(name->u.sym) : -1;
+        return bit >= 0 && !is_live_at_entry(loop.exit, bit);
+    });
 }
 
 // What was said of the loop, or marks its place.
@@ -114,7 +112,7 @@ bool improve_single_loop(const PLAIN_LOOP& loop, long most) {
 
 // A loop around one that goes is looked at in the next round.
 bool improve_loops() {
-    need(fact::loops | fact::alias_marks);
+    need(fact::loops);
     std::vector<std::pair<PLAIN_LOOP, long>> loops;
     for (const auto& loop : currfuninfo->loops->inner_first()) {
         PLAIN_LOOP plain;
@@ -126,10 +124,16 @@ bool improve_loops() {
     return any;
 }
 
+bool any_promise() {
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        if (most_iterations(bb) > 0) return true;
+    return false;
+}
+
 } // namespace
 
 void restructure_loops() {
-    if (unique_triples.empty()) return;
+    if (unique_triples.empty() || !any_promise()) return;
     for (int left = MOST_ROUNDS; left > 0 && improve_loops(); --left) {
         elim_dead_assigns(0, 0);
         simpcfg(0, 0);

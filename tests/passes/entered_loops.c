@@ -134,13 +134,13 @@ int stepped(int s) {
 // FUNCTION: promised
 // HAS: /MUST_ITERATE/
 // HAS: /^L\d+:/
-// HAS: /w == 3/
+// HAS: /w == 4/
 // COUNT 2: MUST_ITERATE
 long promised(int k, int *p) {
     int w, j;
     long s = 0;
-    _Pragma("MUST_ITERATE(1, 1)")
-    for (w = 2; w != 3; w++) {
+    _Pragma("MUST_ITERATE(2, 2)")
+    for (w = 2; w != 4; w++) {
         p[w & 7] = g[w];
         n += p[k & 7];
     }

@@ -18,8 +18,9 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
+#include "OPT5/mvp/mvp.h"
 #include "OPT5/simp/simp.h"
-#include "OPT5/vp/vp_eval.h"
+#include "OPT5/vp/vp.h"
 
 #include <algorithm>
 #include <deque>
@@ -198,7 +199,8 @@ struct ARGUMENT {
     FUNINFO *caller, *callee;
     int number;       // of the parameter
     NODE* tree;       // the jump function, or null: anything. Owned
-    vpset range;      // without a jump function, of an integer
+    const NODE *passed, *statement; // as they stand in the caller
+    vpset range; // without a jump function, of an integer: at this call, whatever the caller's parameters are
     std::string text; // for the debug stream
 };
 
@@ -212,7 +214,8 @@ public:
 private:
     void enter_functions();
     void link(FUNINFO* caller);
-    void link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS& reads);
+    void link_call(FUNINFO* caller, const NODE* call, const NODE* statement, const PARAMETER_READS& reads);
+    void find_ranges(FUNINFO* caller, size_t first);
     void give_up(FUNINFO* callee);
     void iterate();
     bool meet(const ARGUMENT& a);
@@ -225,7 +228,7 @@ private:
     bool fall(FORMAL& formal) const;
     void decide(FUNINFO* f);
     void print(FUNINFO* f) const;
-    void print_argument(const char* what, const ARGUMENT& a) const;
+    void print_argument(const char* format, const ARGUMENT& a) const;
     static void report(FUNINFO* f);
 
     std::vector<FUNINFO*> functions; // with formals, callers first
@@ -290,12 +293,12 @@ void SOLVER::give_up(FUNINFO* callee) {
     }
 }
 
-void SOLVER::print_argument(const char* what, const ARGUMENT& a) const {
-    debug_printf("\n--> %s call from %s to %s, arg %d (%s):  aarg %s", what, a.caller->name.c_str(), a.callee->name.c_str(),
-                 a.number, formals.at(a.callee)[static_cast<size_t>(a.number)].parm->name, a.text.c_str());
+void SOLVER::print_argument(const char* format, const ARGUMENT& a) const {
+    debug_printf(format, a.caller->name.c_str(), a.callee->name.c_str(), a.number,
+                 formals.at(a.callee)[static_cast<size_t>(a.number)].parm->name, a.text.c_str());
 }
 
-void SOLVER::link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS& reads) {
+void SOLVER::link_call(FUNINFO* caller, const NODE* call, const NODE* statement, const PARAMETER_READS& reads) {
     FUNINFO* callee = find_FUNINFO_for_call(call);
     auto at = callee ? formals.find(callee) : formals.end();
     if (at == formals.end()) return;
@@ -307,22 +310,18 @@ void SOLVER::link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS&
         FORMAL& formal = at->second[i];
         const bool by_value = formal.parm->type->is_scalar() && passed->op != ARGREF;
         if (by_value && passed->type->size != formal.parm->type->size) give_up(callee);
-        ARGUMENT a{caller, callee, static_cast<int>(i), nullptr, {}, {}};
+        ARGUMENT a{caller, callee, static_cast<int>(i), nullptr, passed, statement, {}, {}};
         if (by_value && kinds_agree(passed->type, formal.parm->type)) a.tree = reads.jump_function(passed);
         if (print_debug) {
             a.text = text_of(passed);
-            print_argument("Linking", a);
+            print_argument("\n--> Linking call from %s to %s, arg %d (%s):  aarg %s", a);
             if (a.tree)
                 debug_printf(", parm -> %s (tree %s (level %c))\n", formal.parm->name, text_of(a.tree).c_str(), formal.level);
             else
                 debug_printf(", parm %s\n[Bottoming tree for %s]\n", formal.parm->name, formal.parm->name);
         }
         if (!a.tree) fall(formal);
-        if (!a.tree && by_value && has_vpset(passed->type)) {
-            init_vpenv_allocation({}, 0);
-            a.range = vpset_of_tree(passed, vpenv());
-            erase_vpenv();
-        }
+        if (!a.tree && (!by_value || !has_vpset(passed->type))) a.passed = nullptr;
         if (a.tree)
             for_each_subtree(static_cast<const NODE*>(a.tree), [&](const NODE* t) {
                 if (t->op != NAME || t->u.sym->level != 1) return;
@@ -332,15 +331,48 @@ void SOLVER::link_call(FUNINFO* caller, const NODE* call, const PARAMETER_READS&
     }
 }
 
+// What the caller's other arguments, from `first` on, may be at their calls.
+void SOLVER::find_ranges(FUNINFO* caller, size_t first) {
+    std::unordered_map<const NODE*, std::vector<size_t>> of_statement; // looked up
+    bool names_a_local = false;
+    for (size_t i = first; i < arguments.size(); ++i) {
+        const ARGUMENT& a = arguments[i];
+        if (a.tree || !a.passed) continue;
+        of_statement[a.statement].push_back(i);
+        names_a_local |= any_subtree(a.passed, [](const NODE* t) { return t->op == NAME && t->u.sym && t->u.sym->level == 2; });
+    }
+    if (of_statement.empty()) return;
+    auto evaluate_at = [&](const NODE* statement, vpenv env) {
+        if (auto at = of_statement.find(statement); at != of_statement.end())
+            for (size_t i : at->second) arguments[i].range = vpset_of_tree(arguments[i].passed, env);
+    };
+    if (names_a_local) construct_vpsets_for_cfg(1);
+    if (!vpenv_store) init_vpenv_allocation({}, 0);
+    for (size_t i = first; i < arguments.size(); ++i)
+        if (!arguments[i].tree && arguments[i].passed) arguments[i].range = vpset_of_tree(arguments[i].passed, vpenv());
+    for (const BBLK* bb = caller->bb_list; bb && names_a_local; bb = bb->dflink) {
+        const vpenv* entry = bb_vpenv(bb, false);
+        vpenv env = entry ? *entry : vpenv();
+        for (const LIST* s = bb->statements; s && entry; s = s->rest) {
+            const VP_EFFECT effect(s->first);
+            evaluate_at(s->first, effect.during(env));
+            env = effect.behind(env, false);
+        }
+    }
+    deconstruct_vpsets_for_cfg();
+}
+
 void SOLVER::link(FUNINFO* caller) {
     if (!caller->bb_list) return;
     const CURRENT current(caller);
     const PARAMETER_READS reads(caller);
+    const size_t first = arguments.size();
     for_each_tree(caller, [&](const NODE* tree) {
         for_each_subtree(tree, [&](const NODE* t) {
-            if (op_is_call(t->op)) link_call(caller, t, reads);
+            if (op_is_call(t->op)) link_call(caller, t, tree, reads);
         });
     });
+    find_ranges(caller, first);
 }
 
 // With the values that the caller's parameters have by now.
@@ -376,7 +408,7 @@ bool SOLVER::meet_trees(const ARGUMENT& a) {
     NODE* value = nullptr;
     const LEVEL::KIND level = evaluate(a, &value);
     if (print_debug) {
-        print_argument("Iterating", a);
+        print_argument("\n--> Iterating call from %s to %s, arg %d (%s):  aarg %s", a);
         debug_printf("\n  --> Meeting %s (fparm, level %c)", formal.parm->name, formal.level);
         debug_printf(" with %s (aarg, level %c) in call from %s to %s, arg %d\n", a.text.c_str(), level, a.caller->name.c_str(),
                      a.callee->name.c_str(), a.number);
@@ -481,6 +513,18 @@ bool is_worth_it(const FORMAL& formal) {
     return !of_object || formal.may_be_address;
 }
 
+// Of the variable that the body reads: a local that the prolog gives the parameter's value, or the parameter itself.
+void assert_formal(FUNINFO* f, const FORMAL& formal) {
+    if (!formal.value && (!formal.has_values || vpset_is_empty(formal.values))) return;
+    const LIST* first = f->bb_list->statements;
+    if (!stmt_is_arg_prolog(first)) return;
+    SYMTAB* read = nullptr;
+    for_each_subtree(static_cast<const NODE*>(first->first), [&](const NODE* t) {
+        if (t->op == ASG && t->left->op == NAME && t->right->op == NAME && t->right->u.sym == formal.parm) read = t->left->u.sym;
+    });
+    if (read && read->type->size == formal.parm->type->size) assert_values_on_entry(f, read, formal.values, formal.value);
+}
+
 void SOLVER::decide(FUNINFO* f) {
     std::vector<FORMAL>& list = formals.at(f);
     if (print_debug) print(f);
@@ -488,9 +532,15 @@ void SOLVER::decide(FUNINFO* f) {
     for (size_t i = 0; i < list.size(); ++i) {
         FORMAL& formal = list[i];
         if (formal.has_values && !vpset_is_empty(formal.values)) enter_vpset_of_formal_parm(f, formal.parm->name, formal.values);
+        if (formal.level != LEVEL::ONE_VALUE && formal.has_values && vpset_is_single(formal.values) && !formal.parm->type->is_enum()) {
+            formal.level = LEVEL::ONE_VALUE;
+            formal.value = mk_ICON(to_int65(vpset_minimum(formal.values)), formal.parm->type->stqs());
+        }
+        if (values_are_asserted()) assert_formal(f, formal);
         if (formal.level != LEVEL::ONE_VALUE) continue;
-        if (!formal.may_go || !is_worth_it(formal)) {
+        if (!formal.may_go || !is_worth_it(formal) || values_are_asserted()) {
             erase_tree(formal.value);
+            formal.value = nullptr;
             continue;
         }
         f->formals[i].kind = 1;
@@ -544,7 +594,9 @@ void analyze_cg_for_ipcp() {
 void do_interprocedural_propagation() {
     constexpr int LEAST_LEVEL = 3;
     if (!cg_list) set_up_and_build_call_graph();
-    if (!cg_list || opt_level() < LEAST_LEVEL || !enter_formals()) return;
+    if (!cg_list) return;
+    if (do_IP_MVP) return do_IP_metavalue_propagation();
+    if (opt_level() < LEAST_LEVEL || !enter_formals()) return;
     analyze_cg_for_ipcp();
     summarize_pointer_parameters();
 }

@@ -5,7 +5,10 @@
 //     vp_eval.cpp            sets of trees, what conditions and statements do to an environment
 //     vp_builtins.cpp        the same of built-in functions
 //     value_propagation.cpp  the fixpoint over the blocks
-//     vp_rewrite.cpp         what the sets settle: rewrites, facts of loops, trip counts
+//     vp_loops.cpp           what the sets and the loop hierarchy tell each other
+//     vp_formals.cpp         what all calls pass in parameters
+//     vp_rewrite.cpp         what the sets settle
+//     vp_check.cpp           sets as assertions
 #pragma once
 
 #include "OPT5/vp/vp_eval.h"
@@ -31,3 +34,9 @@ NODE* prop_values_in_tree(NODE* tree, vpenv env, bool lvalue, BBLK* bb);
 extern bool vp_changed;
 // The predicates that say what is known of the symbol, in new trees; `extra` is joined to the set if it is not null.
 std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extra, SYMTAB* sym);
+
+// ---- vp_check.cpp
+bool values_are_asserted(); // as a debug switch wants it
+void assert_bindings(BBLK* bb, vpenv env);
+// Of the symbol behind the argument prolog, the first statement: that it has the value, or one of the set where that is null.
+void assert_values_on_entry(class FUNINFO* f, SYMTAB* sym, const vpset& set, const NODE* value);

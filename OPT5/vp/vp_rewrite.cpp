@@ -28,8 +28,6 @@ bool vp_changed = false;
 
 namespace {
 
-register_option pass_debug_vp_asserts("debug:vp_asserts"); // each binding at the entry of a block becomes an assertion
-
 bool is_integer(const TYPE* t) { return has_value_range(t) && !t->is_enum() && !t->is_bool(); }
 
 // A part whose operands are not values: what it says would change with them.
@@ -342,35 +340,6 @@ bool rewrite_block(BBLK* bb, vpenv env) {
     return any;
 }
 
-// ---- Assertions for a check
-
-// One of the slices holds the symbol's value.
-NODE* membership(const vpset& set, SYMTAB* sym) {
-    NODE* any = nullptr;
-    const bool wraps = !wraps_signed(sym->type);
-    for (const VPSLICE& s : set) {
-        NODE* in = comparison(wraps ? UGE : GE, sym, s.low);
-        in = maketree(ANDAND, in, comparison(wraps ? ULE : LE, sym, s.high), tp->int_t);
-        if (s.step > 1 && s.step < static_cast<WIDE>(1) << (sym->type->size - 1)) {
-            TYPE* type = tp->mk_unsigned(sym->type->stqs());
-            NODE* distance = maketree(MINUS, coerce_to_type(type, mk_NAME(sym)), mk_ICON(to_int65(s.low), type), type);
-            NODE* rest = maketree(MOD, distance, mk_ICON(to_int65(s.step), type), type);
-            in = maketree(ANDAND, in, maketree(EQ, rest, mk_ICON(INT65(0), type), tp->int_t), tp->int_t);
-        }
-        any = any ? maketree(OROR, any, in, tp->int_t) : in;
-    }
-    return any;
-}
-
-void assert_bindings(BBLK* bb, vpenv env) {
-    vpenv_store->for_each_binding(env, [&](int number, const vpset& set) {
-        SYMTAB* sym = vpenv_store->symbol(number);
-        if (!is_integer(sym->type)) return;
-        insert_before(&bb->statements, maketree(NASSERT, membership(set, sym), nullptr, tp->int_t), nullptr);
-        currfuninfo->has_nasserts = true;
-    });
-}
-
 } // namespace
 
 std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extra, SYMTAB* sym) {
@@ -420,7 +389,7 @@ void do_value_propagation() {
             tell_loop_of_values(bb->loop, *entry);
         }
         new_assertions |= rewrite_block(bb, *entry);
-        if (pass_debug_vp_asserts) assert_bindings(bb, *entry);
+        if (values_are_asserted()) assert_bindings(bb, *entry);
     }
     deconstruct_vpsets_for_cfg();
 }

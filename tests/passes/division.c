@@ -94,7 +94,7 @@ int main(void) {
     static const long values[] = {0, 1, 6, 7, -1, -7, -8, 999, 1000, -1000, 32767, -32767, -32767 - 1};
     for (unsigned i = 0; i < sizeof values / sizeof *values; i++) {
         int x = (int)values[i];
-        put_i32(by_a_negative(values[i] * 65537L));
+        put_i32(by_a_negative(values[i] * 65535L));
         put_i64(widest(values[i]));
         put_i64(widest_by_seven(values[i]));
         put_i16(guarded((int)(i & 3), x));

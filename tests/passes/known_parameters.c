@@ -75,6 +75,21 @@ static int upward(int d, int m) { return d > m ? d : d < 0 ? -5 : upward(d + 3, 
 #pragma FUNC_CANNOT_INLINE(downward)
 static int downward(int d, int m) { return d < m ? d : d < 0 ? -5 : downward(d - 3, m) + 1; }
 
+// What locals of the callers may be at the calls; one value of them.
+// FUNCTION: of_counter
+// NOT: 99
+// NOT: 98
+#pragma FUNC_CANNOT_INLINE(of_counter)
+static int of_counter(int n) {
+    if (n > 20) hits += 99;
+    return n & 1 ? 98 : n;
+}
+// FUNCTION: of_local
+// HAS: 0 k: int, class 17, qualifiers 0000, 16 bits aligned to 16, level 1
+// HAS: end of arguments
+#pragma FUNC_CANNOT_INLINE(of_local)
+static int of_local(int n, int k) { return n * k; }
+
 // No argument is left.
 // FUNCTION: alone
 // HAS: /^function _alone/
@@ -104,7 +119,12 @@ int exported(int n) { return n * n; }
 int main(void) {
     int (*fp)(int) = by_pointer;
     volatile int one = 1;
-    int i, r = 0;
+    int i, r = 0, v = 5;
+    if (one) v = counter + 5 - counter;
+    for (i = 0; i < 20; i += 2) r += of_counter(i);
+    if (one) v = 5;
+    put_i16(r + of_local(v, one) + of_local(5, one));
+    r = 0;
     for (i = 0; i < 3; i++) r += loop(8, g, i, -1, 2.5f);
     put_i16(r); put_i16(loop(8, g, one + 6, -1L, 2.5f));
     put_i16(even(3, one + 4, 9)); put_i16(odd(3, one + 7, 9));

@@ -8,6 +8,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <random>
 #include <set>
 
@@ -53,11 +54,15 @@ protected:
     }
 
     std::mt19937 random{20};
-    static constexpr int ROUNDS = 8000;
+    // VP_ROUNDS: as many as that.
+    static int rounds() {
+        const char* text = std::getenv("VP_ROUNDS");
+        return text ? std::atoi(text) : 8000;
+    }
 };
 
 TEST_F(VPSET, SlicesLoseNothing) {
-    for (int n = 0; n < ROUNDS; ++n) {
+    for (int n = 0; n < rounds(); ++n) {
         const VPSLICE a = slice(), b = slice();
         VPSLICE rest;
         vpslice_difference(&rest, a, b);
@@ -72,7 +77,7 @@ TEST_F(VPSET, SlicesLoseNothing) {
 }
 
 TEST_F(VPSET, UnionAndIntersection) {
-    for (int n = 0; n < ROUNDS; ++n) {
+    for (int n = 0; n < rounds(); ++n) {
         const vpset a = set(), b = set();
         const std::string what = vpset2string(a) + " and " + vpset2string(b);
         vpset both, common, without, within;
@@ -113,7 +118,7 @@ TEST_F(VPSET, UnionAndIntersection) {
 }
 
 TEST_F(VPSET, Arithmetic) {
-    for (int n = 0; n < ROUNDS; ++n) {
+    for (int n = 0; n < rounds(); ++n) {
         const vpset a = set(), b = set();
         const int d = 1 + below(20), shift = below(5);
         const std::string what = vpset2string(a) + " with " + vpset2string(b) + " or " + std::to_string(d);
@@ -145,7 +150,7 @@ TEST_F(VPSET, Arithmetic) {
 }
 
 TEST_F(VPSET, Types) {
-    for (int n = 0; n < ROUNDS; ++n) {
+    for (int n = 0; n < rounds(); ++n) {
         vpset s;
         VPSLICE_LIST list;
         for (int k = 1 + below(4); k > 0; --k) {

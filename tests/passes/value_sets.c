@@ -204,6 +204,21 @@ int intrinsics(int a, int b) {
     return a + b;
 }
 
+// What a call writes through an argument is not what was there; a remainder by nothing is not folded.
+// FUNCTION: written
+// HAS: /s (==|!=) 3/
+int written(long n) {
+    int s = 3;
+    n = __norm32(n, &s);
+    return s == 3 ? 5 : (int)n;
+}
+// FUNCTION: by_nothing
+// HAS: 7 % 0
+int by_nothing(int n) {
+    if (n == 0 && x[0] == 12345) return 7 % n;
+    return n;
+}
+
 // Over all that an int holds.
 static unsigned sum_of_all(int (*f)(int)) {
     unsigned sum = 0;
@@ -231,6 +246,7 @@ int main(void) {
     }
     put_i16(nested() + h);
     for (i = 0; i < 16; i++) a[i >> 2][i & 3] = i * 3 % 7;
+    put_i16(written(40L) + by_nothing(0));
     at = x;
     put_i16(null(x + 3) + (at == x) + null(0) + (at == 0));
     for (i = 0; i < 12; i++) put_i16(by_array(i) + by_power(9 * i, i) + by_other(100 * i, i) + intrinsics(i, -i));

@@ -195,7 +195,7 @@ private:
         asg->right = nullptr;
         erase_tree(t);
         NODE* tree = value ? peel_for_effect(value) : nullptr;
-        if (tree) OPT_ASSERT(tree->op != SSA_CHI && tree->op != SSA_DEF);
+        OPT_ASSERT(!tree || (tree->op != SSA_DEF));
         return tree;
     }
 

@@ -213,7 +213,7 @@ int written(long n) {
     return s == 3 ? 5 : (int)n;
 }
 // FUNCTION: by_nothing
-// HAS: 7 % 0
+// HAS: return 7 % 0
 int by_nothing(int n) {
     if (n == 0 && x[0] == 12345) return 7 % n;
     return n;

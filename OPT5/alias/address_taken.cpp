@@ -65,6 +65,7 @@ void mark_addressed_by_operands(const NODE* t, int& writes) {
 // their left operand to `writes`.
 void mark_addressed(const NODE* t, bool is_access_address, int& writes) {
     while (t) {
+        if (t->op == ICON) return;
         writes += writes_left_operand(t->op);
         const NODE* next = t->left;
         bool keeps = false;
@@ -126,7 +127,8 @@ void mark_addressed(const NODE* t, bool is_access_address, int& writes) {
         case IDENTITY:
         case OUIALIGN:
         case NONALIGN: keeps = is_access_address && t->type->is_pointer(); break;
-        default: mark_addressed(t->right, false, writes);
+        default:
+            if (t->right) mark_addressed(t->right, false, writes);
         }
         is_access_address = keeps && next && next->type->is_pointer();
         t = next;

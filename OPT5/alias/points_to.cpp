@@ -44,6 +44,7 @@ private:
     PT_STATE joined(const BLOCK& b) const;
     bool visit(BLOCK& b);
     bool propagate();
+    void bind_accesses_of(const BLOCK& b, const PT_TRANSFER::LOOK& bind);
     BLOCK& of(const BBLK* bb) { return blocks[static_cast<size_t>(bb->dfn)]; }
     const BLOCK& of(const BBLK* bb) const { return blocks[static_cast<size_t>(bb->dfn)]; }
 
@@ -154,6 +155,17 @@ void walk(const BBLK* bb, const PT_STORE& store, PT_TRANSFER& transfer, const PT
     for (const LIST* l = bb->statements; l; l = l->rest) transfer.statement(l->first, s, look);
 }
 
+// The other statements leave the state as it is.
+void PROPAGATION::bind_accesses_of(const BLOCK& b, const PT_TRANSFER::LOOK& bind) {
+    PT_STATE s = store.into[b.bb];
+    auto acting = b.acting.begin();
+    for (const LIST* l = b.bb->statements; l; l = l->rest)
+        if (acting != b.acting.end() && *acting == l->first)
+            transfer.statement(*acting++, s, bind);
+        else
+            bind(l->first, s);
+}
+
 void PROPAGATION::run() {
     find_pointers();
     if (store.pointers.empty()) return;
@@ -161,9 +173,9 @@ void PROPAGATION::run() {
         store.into = store.out_of = SIDE_TABLE<PT_STATE>();
         return;
     }
+    const PT_TRANSFER::LOOK bind = [this](const NODE* t, const PT_STATE& s) { transfer.bind_accesses(t, s); };
     for (const BLOCK& b : blocks)
-        if (b.is_reached)
-            walk(b.bb, store, transfer, [this](const NODE* t, const PT_STATE& s) { transfer.bind_accesses(t, s); });
+        if (b.is_reached) bind_accesses_of(b, bind);
 }
 
 void dump_state(const PT_STORE& store, const PT_STATE& s) {

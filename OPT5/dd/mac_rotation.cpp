@@ -15,6 +15,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/remark.h"
 #include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
@@ -269,9 +270,12 @@ void ROTATOR::run() {
     std::vector<BBLK*> blocks;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) blocks.push_back(bb);
     for (BBLK* bb : blocks) rotate(bb);
-    if (remarks_are_wanted)
+    if (remarks_are_wanted) {
+        need(fact::loops);
+        const NATURAL_LOOPS& loops = *currfuninfo->loops;
         for (BBLK* bb : blocks)
-            if (is_in_cycle(bb)) tell_of_block(bb);
+            if (loops.around(bb) || (loops.has_other_cycles() && is_in_cycle(bb))) tell_of_block(bb);
+    }
     if (has_new_temps) sym_split(currfuninfo);
     changed(has_new_blocks ? fact::none : fact::graph);
     // Behind the last iteration nobody may want its steps.

@@ -155,7 +155,7 @@ void COLLECTOR::collect(const BBLK* bb) {
 // In the order of evaluation.
 void COLLECTOR::walk(NODE** link, bool is_conditional) {
     NODE* t = *link;
-    if (!t) return;
+    if (!t || (!t->left && !t->right)) return;
     if (opcode_is_ASG(t->op)) {
         walk(&t->right, is_conditional);
         walk(&t->left, is_conditional);

@@ -370,6 +370,12 @@ void STORE_PROMOTER::promote(std::vector<STORED*> stored) {
     has_empty_cells.clear();
 }
 
+bool is_stored_to(const CANDIDATE& c) {
+    return c.reference && may_be_stored_to(c) && std::any_of(c.events.begin(), c.events.end(), [](const PROMOTION_EVENT& e) {
+               return e.kind == PROMOTION_EVENT::DEF;
+           });
+}
+
 bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidates) {
     summarize();
     find_stored(candidates);
@@ -394,6 +400,7 @@ bool STORE_PROMOTER::run(const std::vector<std::unique_ptr<CANDIDATE>>& candidat
 } // namespace
 
 bool promote_stores(const std::vector<std::unique_ptr<CANDIDATE>>& candidates, PROMOTION_TEMPS& temps) {
+    if (std::none_of(candidates.begin(), candidates.end(), [](const auto& c) { return is_stored_to(*c); })) return false;
     need(fact::loops | fact::alias);
     return STORE_PROMOTER(temps).run(candidates);
 }

@@ -377,7 +377,7 @@ private:
     static bool is_around_use(const NODE* t) { return t->op == SSA_MU || t->op == SSA_CHI; }
 
     NODE* replace(NODE* t, bool is_place) {
-        if (!t) return t;
+        if (!t || (!t->left && !t->right)) return t;
         if (t->op == SSA_USE && !is_place)
             if (NODE* value = rewrite_is_allowed(t) ? value_for(t) : nullptr) {
                 if (print_debug) {

@@ -169,6 +169,7 @@ private:
     std::vector<size_t> first_before;
     // While chis are placed: what is live, that which is memory as a list.
     std::vector<SSAVAR*> live_memory;
+    std::vector<uint32_t> live; // all that was, in the block in work
     std::vector<int32_t> place_of; // by variable: 0 dead, below 0 live, otherwise 1 + its place in `live_memory`
     // While renaming.
     std::vector<NODE*> current; // by variable
@@ -285,7 +286,7 @@ void BUILDER::make_dead(SSAVAR* v) {
 }
 
 void BUILDER::place_chis_in(size_t block, SSA_CHANGES& changes) {
-    std::vector<uint32_t> live;
+    live.clear();
     for (const EDGE* s = build.blocks[block]->successors; s; s = s->rest)
         for (uint32_t uid : live_at_entry[static_cast<size_t>(s->first->dfn)]) {
             if (place_of[uid] == 0) live.push_back(uid);

@@ -35,9 +35,8 @@ public:
     void statement(LIST* cell) {
         NODE* t = cell->first;
         is_root_written = opcode_is_ASG(t->op);
-        writes = 0;
-        for_each_subtree(static_cast<const NODE*>(t),
-                         [this, t](const NODE* n) { writes += writes_within(n) && !(is_root_written && n == t); });
+        root = t;
+        writes = NOT_COUNTED;
         is_operand_of_only_write = false;
         if (is_root_written)
             assignment(&cell->first);
@@ -62,9 +61,18 @@ private:
     }
     void site(SSA_SITE::KIND kind, NODE** link, NODE* node) { build.sites.push_back({kind, link, node}); }
 
+    static constexpr int NOT_COUNTED = -1;
+    int count_writes() {
+        if (writes != NOT_COUNTED) return writes;
+        writes = 0;
+        for_each_subtree(root, [this](const NODE* n) { writes += writes_within(n) && !(is_root_written && n == root); });
+        return writes;
+    }
+
     SSA_BUILD& build;
     std::unordered_set<const SYMTAB*> refused; // membership only
-    int writes = 0;                            // of the statement, its root assignment aside
+    const NODE* root = nullptr;                // of the statement, while its writes are not counted
+    int writes = 0;                            // of the statement, its root assignment aside; NOT_COUNTED
     bool is_root_written = false, is_operand_of_only_write = false;
 };
 
@@ -102,14 +110,14 @@ void WRAPPER::access(NODE** link) {
     else
         value(base); // a member of a value
     if (!v) return is_access((*base)->op) ? note_untracked(t) : void();
-    if (v->is_memory() && writes > 0 && !is_operand_of_only_write) return;
+    if (v->is_memory() && !is_operand_of_only_write && count_writes() > 0) return;
     *link = make_SSA_USE(t, v, nullptr);
     site(SSA_SITE::USE, link, *link);
 }
 
 void WRAPPER::operands_of_write(NODE* t) {
     const bool before = is_operand_of_only_write;
-    is_operand_of_only_write = writes == 1;
+    is_operand_of_only_write = count_writes() == 1;
     if (t->right) value(&t->right);
     if (t->left) value(&t->left);
     is_operand_of_only_write = before;

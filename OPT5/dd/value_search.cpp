@@ -44,7 +44,12 @@ struct DEFINITION {
 struct SYMBOL_DEFINITIONS {
     std::vector<DEFINITION> all; // by block number and place
     std::vector<int> meets;      // blocks where several of them meet, ascending
+    std::vector<bool> is_marked; // by block number: one of them stands there, or several meet
     bool meets_are_known = false;
+    bool is_empty(const BBLK* bb) const { // of a block that was there when they were marked
+        const size_t b = static_cast<size_t>(bb->dfn);
+        return b < is_marked.size() && !is_marked[b];
+    }
 };
 
 // Where control is: ahead of a statement of a block, or at its end.
@@ -93,6 +98,9 @@ private:
             for (const DEFINITION& x : d.all)
                 if (!x.is_assertion && (in.empty() || in.back() != x.bb->dfn)) in.push_back(x.bb->dfn);
             d.meets = frontiers->iterated(in);
+            d.is_marked.assign(static_cast<size_t>(currfuninfo->bb_count) + 1, false);
+            for (const DEFINITION& x : d.all) d.is_marked[static_cast<size_t>(x.bb->dfn)] = true;
+            for (int b : d.meets) d.is_marked[static_cast<size_t>(b)] = true;
             d.meets_are_known = true;
         }
         return d.meets;
@@ -113,19 +121,21 @@ REACHING DEFINITIONS::reaching(const SYMTAB* sym, POINT at, int& budget, bool wi
     const std::vector<int>& meet_blocks = meets(d);
     BBLK* bb = at.bb;
     for (int place = at.place; --budget > 0; place = AT_END) {
-        auto it = std::lower_bound(
-            d.all.begin(), d.all.end(), std::make_pair(bb->dfn, place),
-            [](const DEFINITION& a, const std::pair<int, int>& b) { return std::make_pair(a.bb->dfn, a.place) < b; });
-        while (it != d.all.begin() && std::prev(it)->bb == bb && std::prev(it)->is_assertion && !with_assertions) --it;
-        if (it != d.all.begin() && std::prev(it)->bb == bb) {
-            r.kind = REACHING::DEFINED;
-            r.definition = &*std::prev(it);
-            return r;
-        }
-        if (std::binary_search(meet_blocks.begin(), meet_blocks.end(), bb->dfn)) {
-            r.kind = REACHING::MEET;
-            r.meet = bb;
-            return r;
+        if (!d.is_empty(bb)) {
+            auto it = std::lower_bound(
+                d.all.begin(), d.all.end(), std::make_pair(bb->dfn, place),
+                [](const DEFINITION& a, const std::pair<int, int>& b) { return std::make_pair(a.bb->dfn, a.place) < b; });
+            while (it != d.all.begin() && std::prev(it)->bb == bb && std::prev(it)->is_assertion && !with_assertions) --it;
+            if (it != d.all.begin() && std::prev(it)->bb == bb) {
+                r.kind = REACHING::DEFINED;
+                r.definition = &*std::prev(it);
+                return r;
+            }
+            if (std::binary_search(meet_blocks.begin(), meet_blocks.end(), bb->dfn)) {
+                r.kind = REACHING::MEET;
+                r.meet = bb;
+                return r;
+            }
         }
         BBLK* above = currfuninfo->dominators->immediate_dominator(bb->dfn);
         if (!above || above == bb) {

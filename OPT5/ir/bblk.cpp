@@ -74,6 +74,7 @@ namespace {
 // The control statement of every block in list order, for callers that look more than once.
 std::vector<NODE*> collect_branches() {
     std::vector<NODE*> branches;
+    branches.reserve(static_cast<size_t>(currfuninfo->bb_count));
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         if (NODE* branch = bb->branch()) branches.push_back(branch);
     return branches;

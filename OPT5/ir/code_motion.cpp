@@ -17,6 +17,7 @@ constexpr CANDIDATES ALL = ~CANDIDATES(0);
 
 std::vector<size_t> numbers_of(const EDGE* list) {
     std::vector<size_t> numbers;
+    numbers.reserve(static_cast<size_t>(edge_length(list)));
     for (; list; list = list->rest) numbers.push_back(static_cast<size_t>(list->first->dfn));
     return numbers;
 }

@@ -235,8 +235,13 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::number(const NODE* t) {
-    if (replaced) return find(t);
     auto at = known.find(t);
+    if (replaced) {
+        const bool keeps_its_number = at != known.end() && !any_subtree(t, [this](const NODE* n) {
+            return n->op == NAME && n->u.sym == replaced;
+        });
+        return keeps_its_number ? at->second : find(t);
+    }
     return at != known.end() ? at->second : known[t] = find(t);
 }
 

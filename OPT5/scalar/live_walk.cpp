@@ -10,7 +10,7 @@
 #include <vector>
 
 void BACKWARD_WALK::block(BBLK* bb) {
-    std::vector<LIST*> cells;
+    cells.clear();
     for (LIST* s = bb->statements; s; s = s->rest) cells.push_back(s);
     bool kills = true;
     for (auto it = cells.rbegin(); it != cells.rend(); ++it) {

@@ -3,8 +3,11 @@
 
 #include "OPT5/scalar/eda.h"
 
+#include <vector>
+
 class NODE;
 class BBLK;
+struct LIST;
 
 // Visits reads and writes of candidate variables, last first. What stands in a part that is evaluated under a
 // condition, or in a statement that an exception may leave, does not kill: an earlier value may survive it.
@@ -29,6 +32,7 @@ private:
     NODE* walk_conditional(NODE* t);
     NODE* without_store(NODE** assignment, bool discard);
     NODE* walk_commas(NODE* t, bool discard);
+    std::vector<LIST*> cells; // of the block in work
     bool kills_now = true;
     bool at_root = false;
 };

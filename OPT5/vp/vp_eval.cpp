@@ -119,7 +119,11 @@ private:
     }
     static vpset truth_values() { return vpset(VPSLICE{0, 1, 1}); }
 
+    // Of a load and of a variable without a binding the type alone speaks then.
+    static bool nothing_is_asserted() { return currfuninfo && currfuninfo->givens.empty(); }
+
     vpset plain_range(const NODE* t) const {
+        if (t->op == UMULT && nothing_is_asserted()) return bottom(t->type);
         INT65 min, max;
         if (!calculate_bounds(t, nullptr, &min, &max)) return bottom(t->type);
         return vpset(make_vpslice(to_wide(min), to_wide(max), 1));
@@ -142,7 +146,8 @@ private:
         case NAME: {
             vpset passed;
             const bool is_passed = t->u.sym && t->type->stqs() == t->u.sym->type->stqs() && find_vpset_in_formal_parms(&passed, t->u.sym);
-            return is_passed ? passed : plain_range(t);
+            if (is_passed) return passed;
+            return nothing_is_asserted() && number_of_name(t) >= 0 ? bottom(t->type) : plain_range(t);
         }
         case COMMAOP: return as_type(of(t->right), t->right, t->type);
         case ASG: return t->left->op == NAME ? as_type(of(t->right), t->right, t->type) : plain_range(t);

@@ -84,27 +84,40 @@ vpenv VPENV_STORE::without_globals(vpenv env) {
     return env;
 }
 
+uint32_t VPENV_STORE::joined_pair(uint32_t a, uint32_t b) {
+    const uint64_t pair = static_cast<uint64_t>(std::min(a, b)) << 32 | std::max(a, b);
+    auto it = known_joins.find(pair);
+    if (it == known_joins.end()) {
+        vpset both;
+        vpset_union(&both, sets[pair >> 32], sets[pair & 0xFFFFFFFF]);
+        auto [id, is_new] = ids.try_emplace(both, static_cast<uint32_t>(sets.size()));
+        if (is_new) sets.push_back(both);
+        it = known_joins.emplace(pair, id->second).first;
+    }
+    return it->second;
+}
+
 uint32_t VPENV_STORE::joined_sets(const std::vector<uint32_t>& list, int number) {
     uint32_t all = list[0];
-    for (size_t i = 1; i < list.size() && all; ++i) {
-        const uint64_t pair = static_cast<uint64_t>(std::min(all, list[i])) << 32 | std::max(all, list[i]);
-        auto it = known_joins.find(pair);
-        if (it == known_joins.end()) {
-            vpset both;
-            vpset_union(&both, sets[pair >> 32], sets[pair & 0xFFFFFFFF]);
-            auto [id, is_new] = ids.try_emplace(both, static_cast<uint32_t>(sets.size()));
-            if (is_new) sets.push_back(both);
-            it = known_joins.emplace(pair, id->second).first;
-        }
-        all = it->second;
-    }
+    for (size_t i = 1; i < list.size() && all; ++i) all = joined_pair(all, list[i]);
     return interned(sets[all], number);
+}
+
+// The same of two, which is what most joins are of.
+uint32_t VPENV_STORE::joined(int level, uint32_t a, uint32_t b, int base) {
+    if (a == b || !a || !b) return a == b ? a : 0;
+    if (level < 0) return interned(sets[joined_pair(a, b)], base);
+    PART all;
+    for (int i = 0; i < WIDTH; ++i)
+        all.below[i] = joined(level - 1, parts[a].below[i], parts[b].below[i], base + (i << (BITS * level)));
+    return kept(all);
 }
 
 uint32_t VPENV_STORE::joined(int level, std::vector<uint32_t> list, int base) {
     std::sort(list.begin(), list.end());
     list.erase(std::unique(list.begin(), list.end()), list.end());
     if (list.front() == 0 || list.size() == 1) return list.front();
+    if (list.size() == 2) return joined(level, list[0], list[1], base);
     if (level < 0) return joined_sets(list, base);
     PART all;
     for (int i = 0; i < WIDTH; ++i) {

@@ -68,6 +68,8 @@ private:
     uint32_t bound(int level, uint32_t part, int number, uint32_t set, bool in_place);
     uint32_t cut(int level, uint32_t part, int base);
     uint32_t joined(int level, std::vector<uint32_t> parts, int base);
+    uint32_t joined(int level, uint32_t a, uint32_t b, int base);
+    uint32_t joined_pair(uint32_t a, uint32_t b); // of sets
     uint32_t joined_sets(const std::vector<uint32_t>& sets, int number);
     uint32_t interned(const vpset& set, int number);
     uint32_t kept(const PART& part); // 0 for one without bindings

@@ -293,6 +293,10 @@ bool vpset_without(vpset* out, const vpset& a, WIDE v) {
 }
 
 bool vpset_within(vpset* out, const vpset& a, WIDE low, WIDE high) {
+    if (a.size() == 1 && low <= a[0].low && a[0].high <= high) { // the most frequent case
+        *out = a;
+        return true;
+    }
     VPSLICE_LIST list;
     for (const VPSLICE& s : a) list.push_back(slice_between(std::max(low, s.low), std::min(high, s.high), s));
     *out = vpset_of(list);

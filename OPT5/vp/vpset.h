@@ -25,6 +25,9 @@ struct VPSLICE {
 class VPSLICE_LIST {
 public:
     static constexpr int MOST = 10; // one more merges those that are there
+    VPSLICE_LIST() {}
+    VPSLICE_LIST(const VPSLICE_LIST&) = delete;
+    VPSLICE_LIST& operator=(const VPSLICE_LIST&) = delete;
     void push_back(const VPSLICE& s);
     int size() const { return count; }
     VPSLICE& operator[](int i) { return slices[i]; }
@@ -33,7 +36,9 @@ public:
     void merge(int most); // until there are no more than `most`, and no two join without a gap
 
 private:
-    VPSLICE slices[MOST];
+    union { // beyond `count` there is nothing
+        VPSLICE slices[MOST];
+    };
     int count = 0;
 };
 
@@ -42,8 +47,14 @@ class vpset {
 public:
     static constexpr int MOST_SLICES = 3;
 
-    vpset() = default;
+    vpset() {}
     explicit vpset(const VPSLICE& s) { append(s); }
+    vpset(const vpset& o) { *this = o; }
+    vpset& operator=(const vpset& o) {
+        count = o.count;
+        std::copy(o.slices, o.slices + o.count, slices);
+        return *this;
+    }
     const VPSLICE* begin() const { return slices; }
     const VPSLICE* end() const { return slices + count; }
     int size() const { return count; }
@@ -57,7 +68,9 @@ private:
         if (!s.is_empty()) slices[count++] = s;
     }
 
-    VPSLICE slices[MOST_SLICES];
+    union { // beyond `count` there is nothing
+        VPSLICE slices[MOST_SLICES];
+    };
     int count = 0;
 };
 

@@ -22,8 +22,8 @@ void split_accumulations_in_bb(BBLK* bb); // all but the control statement
 // call in its place. With `allow_s16` the accumulator may have 16 bits.
 bool conversion_to_BIF_call_succeeds(LIST* cell, bool allow_s16);
 // Two accumulations of products of neighbouring 16-bit elements, read as 32-bit words, which the caller knows to be
-// aligned.
-bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell);
+// aligned. `loop`: around them, null if it is not known.
+bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell, struct LOOP* loop = nullptr);
 
 // acc op= R, where R holds a multiplication (see `is_mac`): `t = x * y; acc op= R'` with a new t, in two cells from `cell` on.
 // Its temporary.

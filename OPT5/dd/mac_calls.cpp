@@ -152,7 +152,7 @@ const NODE* multiplication_in(const NODE* t) {
 }
 
 std::string why_no_accumulator(const NODE* sum) {
-    if (sum->op != NAME) return "the sum is in memory: keep it in a local variable during the loop";
+    if (sum->op != NAME) return "the sum is in memory, where the loop may reach it otherwise: keep it in a local variable";
     if (!is_a_likely_zelkova_register(sum->u.sym))
         return "the sum is no local variable, or its address is taken: keep it in a local one during the loop";
     if (is_a_likely_zelkova_accumulator(sum, false)) return "";
@@ -160,7 +160,7 @@ std::string why_no_accumulator(const NODE* sum) {
 }
 
 std::string why_no_product(const NODE* m) {
-    if (!m) return "it multiplies by a constant";
+    if (!m) return "a constant factor has more than 16 bits, or the other one is not read from memory";
     if (m->type->is_float()) return "there is no unit for its floating-point type: see --float_support";
     const NODE *a = m->left, *b = m->right;
     while (a->op == SCONV) a = a->left;
@@ -372,13 +372,19 @@ bool read_dual(NODE* t, int k, DUAL* d) {
     return is_an_s16_UMULT_operand(*d->x[k]) && is_an_s16_UMULT_operand(*d->y[k]);
 }
 
+bool is_same_address(const NODE* a, const NODE* b) {
+    while (a->op == PCONV && a->left->type->is_pointer()) a = a->left;
+    while (b->op == PCONV && b->left->type->is_pointer()) b = b->left;
+    return trees_are_congruent(a, b, false);
+}
+
 // Whether `b` reads the 16-bit word behind the one that `a` reads.
-bool is_next_word(const NODE* a, const NODE* b) {
+bool is_next_word(const NODE* a, const NODE* b, struct LOOP* loop) {
     if (lvalue_is_volatile(a) || lvalue_is_volatile(b)) return false;
-    if (!a->right && !b->right) return tree_difference_is_ivalue(b->left, a->left, INT65(1), nullptr);
-    if (!b->right || !trees_are_congruent(a->left, b->left, false)) return false;
-    return a->right ? tree_difference_is_ivalue(b->right, a->right, INT65(1), nullptr)
-                    : tree_is_ivalue(b->right, INT65(1), nullptr);
+    if (!a->right && !b->right) return tree_difference_is_ivalue(b->left, a->left, INT65(1), loop);
+    if (!b->right || !is_same_address(a->left, b->left)) return false;
+    return a->right ? tree_difference_is_ivalue(b->right, a->right, INT65(1), loop)
+                    : tree_is_ivalue(b->right, INT65(1), loop);
 }
 
 // The 32-bit word of which `t` reads the first half.
@@ -391,7 +397,7 @@ NODE* word_at(NODE* t) {
 
 } // namespace
 
-bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell) {
+bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell, struct LOOP* loop) {
     if (!cell || !cell->rest || memory_is_big_endian) return false;
     DUAL d;
     if (!read_dual(cell->first, 0, &d) || !read_dual(cell->rest->first, 1, &d)) return false;
@@ -401,9 +407,9 @@ bool conversion_to_s32xs32_DMAC_succeeds(LIST* cell) {
     for (int k : {0, 1})
         if (sym_appears_in_tree(d.mac[k]->left->u.sym, d.mac[1 - k]->right) || tree_has_side_effects(d.mac[k]->right))
             return false;
-    if (!is_next_word(*d.x[0], *d.x[1]) || !is_next_word(*d.y[0], *d.y[1])) {
+    if (!is_next_word(*d.x[0], *d.x[1], loop) || !is_next_word(*d.y[0], *d.y[1], loop)) {
         std::swap(d.x[1], d.y[1]);
-        if (!is_next_word(*d.x[0], *d.x[1]) || !is_next_word(*d.y[0], *d.y[1])) return false;
+        if (!is_next_word(*d.x[0], *d.x[1], loop) || !is_next_word(*d.y[0], *d.y[1], loop)) return false;
     }
     if (print_debug) debug_printf("~~~#DMAC#11 %s\n", tree_to_infix(*d.x[0]).c_str());
     NODE *x = word_at(take(d.x[0])), *y = word_at(take(d.y[0]));

@@ -146,7 +146,8 @@ bool DUAL_LOOP::convert_pair() {
     };
     // The second one's accesses are those behind these.
     auto is_aligned = [&](const NODE* n) {
-        return is_lvalue_sufficiently_aligned(n, WORD, loop) || (!any_subtree(n, moves_otherwise) && is_aligned_at_entry(n));
+        return is_lvalue_sufficiently_aligned(n, WORD, loop) ||
+               (!any_subtree(n, moves_otherwise) && is_aligned_at_entry(n));
     };
     auto is_misaligned = [&](const NODE* n) { return n->op == UMULT && !is_aligned(n); };
     LIST* copy = copy_dd_statements(bb->statements);
@@ -163,7 +164,7 @@ bool DUAL_LOOP::convert_pair() {
             if (!temp) temp = sym_temp('T', -1, acc->type->stqs(), nullptr);
             second->u.sym = temp;
         }
-        if (conversion_to_s32xs32_DMAC_succeeds(s)) {
+        if (conversion_to_s32xs32_DMAC_succeeds(s, loop)) {
             if (shares) sum = acc;
             any = true;
         } else if (shares)
@@ -202,16 +203,32 @@ const NODE* DUAL_LOOP::only_mac(std::vector<STEP>& steps) const {
     return sym_appears_in_tree(mac->left->u.sym, test->left) ? nullptr : mac;
 }
 
+// The value of `t` behind so many steps, which the program makes as well: what is signed does not overflow then, so
+// that its conversion to a wider type is stepped.
+NODE* behind_steps(NODE* t, const STEP& step, INT65 times) {
+    if (!t) return nullptr;
+    const NODE* name = t->op == SCONV ? t->left : t;
+    if (name->op == NAME && name->u.sym == step.sym) {
+        const bool widens = t != name && t->type->is_int() && t->type->size > name->type->size &&
+                            name->type->is_int() && name->type->is_signed();
+        if (widens) return maketree(PLUS, t, mk_integer_constant(step.c * times, t->type), t->type);
+        if (t == name) {
+            erase_tree(t);
+            return sum_of(step, times);
+        }
+    }
+    t->left = behind_steps(t->left, step, times);
+    t->right = behind_steps(t->right, step, times);
+    return t;
+}
+
 // The accumulation as it reads in iteration 0 or 1 before any step is made.
-NODE* mac_of_iteration(const NODE* mac, int iteration, const std::vector<STEP>& steps) {
+NODE* mac_of_iteration(const NODE* mac, int iteration, const std::vector<STEP>& steps, struct LOOP* loop) {
     NODE* t = copy_tree(mac);
     for (const STEP& step : steps) {
         const int times = iteration + step.is_ahead;
         if (times == 0) continue;
-        NODE *value = sum_of(step, INT65(times)), *name = mk_NAME(step.sym);
-        t->right = simp_tree(subst_tree_for_lvalue_in_tree(value, name, t->right), nullptr);
-        erase_tree(value);
-        erase_tree(name);
+        t->right = simp_tree(behind_steps(t->right, step, INT65(times)), loop);
     }
     t->right = rewrite_tree(t->right, [](NODE* n) {
         if (n->op == UMULT) n->left = partition_pointer_under_UMULT(n->left, n);
@@ -229,11 +246,12 @@ void show(const char* title, const LIST* list) {
 LIST* DUAL_LOOP::two_iterations(const NODE* mac, const std::vector<STEP>& steps, SYMTAB* temp) const {
     PSN* psn = bb->statements->psn;
     LIST* test = copy_dd_statements(bb->last_statement());
-    LIST* list = mkelist(mac_of_iteration(mac, 0, steps), mkelist(mac_of_iteration(mac, 1, steps), test, psn), psn);
+    LIST* list =
+        mkelist(mac_of_iteration(mac, 0, steps, loop), mkelist(mac_of_iteration(mac, 1, steps, loop), test, psn), psn);
     if (print_debug) show("[duplicated]\n", list);
     NODE* second = list->rest->first;
     second->left = subst_sym_for_sym_in_tree(second->left->u.sym, temp, second->left);
-    if (!conversion_to_s32xs32_DMAC_succeeds(list)) {
+    if (!conversion_to_s32xs32_DMAC_succeeds(list, loop)) {
         erase_tree_list(list);
         return nullptr;
     }
@@ -265,9 +283,11 @@ bool DUAL_LOOP::convert_doubled() {
 // ---- What the programmer is told
 
 std::string DUAL_LOOP::why_not(const NODE* mac) {
-    if (loop_has_subloops(loop) || !is_suitable()) return "the loop has more than one block: take if, ?: and calls out of it";
+    if (loop_has_subloops(loop) || !is_suitable())
+        return "the loop has more than one block: take if, ?: and calls out of it";
     std::vector<STEP> steps;
-    if (loop->has(LOOP_early_exit) || !only_mac(steps)) return "the loop does more than add one product and step by one element";
+    if (loop->has(LOOP_early_exit) || !only_mac(steps))
+        return "the loop does more than add one product and step by one element";
     if (!loop->tripFactor || loop->tripFactor->op != ICON || !(loop->tripFactor->u.lval % INT65(2)).is_zero())
         return "its number of iterations is not known to be even: a constant, or #pragma MUST_ITERATE(2, , 2)";
     const NODE* unaligned = nullptr;
@@ -275,7 +295,8 @@ std::string DUAL_LOOP::why_not(const NODE* mac) {
         if (n->op == UMULT && !unaligned && !is_aligned_at_entry(n)) unaligned = n;
     });
     if (unaligned)
-        return "'" + reference_text(unaligned) + "' is not known to begin on a 32-bit boundary: #pragma DATA_ALIGN(array, 2)";
+        return "'" + reference_text(unaligned) +
+               "' is not known to begin on a 32-bit boundary: #pragma DATA_ALIGN(array, 2)";
     return "both factors must be elements of int that move up by one an iteration";
 }
 

@@ -132,11 +132,11 @@ bool is_in_cycle(BBLK* bb) {
 std::string why_not_rotated(BBLK* bb, const LIST* cell, int products) {
     std::string why = why_no_mac(cell->first);
     if (!why.empty()) return why;
-    if (MAC_LOOP r; !find_rotation(bb, &r)) return "the loop has more than one block: take if, ?: and calls out of it";
+    if (MAC_LOOP r; !find_rotation(bb, &r)) return "the loop has more than one block: take if and calls out of it";
     if (!multiplies_once(bb))
         return "there are " + std::to_string(products) +
                " multiplications an iteration and one multiplier: make a loop of each sum";
-    if (!may_be_late(bb, cell)) return "the loop reads or changes the sum elsewhere";
+    if (!may_be_late(bb, cell)) return "the loop uses the sum elsewhere, and its test or its stores may depend on that";
     return "the hardware has no instruction for this product";
 }
 

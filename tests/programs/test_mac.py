@@ -105,6 +105,7 @@ TAKEN = {  # what programmers write: the loop, and its calls
 }
 # In a unified memory: the loop, and the call.
 DUAL = {
+    "long acc = 5; int j; for (j = 0; j < 8; j++) { for (i = 0; i < 16; i++) acc += (long)h[j * 16 + i] * k[i]; acc ^= j; }": "dmac",
     "long acc = 5; int c = 64; i = 0; while (c-- > 0) { acc += (long)h[i] * h[i]; i++; }": "dmac",
     "long acc = 5; for (i = 0; i < n; i += 2) { acc += (long)h[i] * k[i] >> 1; acc += (long)h[i + 1] * k[i + 1] >> 1; }": "dmac",
     "long acc = 5; for (i = 0; i < n; i += 2) { acc += (long)h[i] * k[i]; acc += (long)h[i + 1] * k[i + 1]; w[i] = acc; }": None,

@@ -224,6 +224,17 @@ private:
         return is;
     }
 
+    // The old variable stays at its first value in the loop: what names it there is about the new one.
+    void update_record(NODE** t) {
+        if (!*t || !sym_appears_in_tree(old, *t)) return;
+        NODE* renamed = rewrite_tree(denormalize_tree(*t, false), [this](NODE* n) {
+            if (n->op != NAME || n->u.sym != old) return n;
+            erase_node(n);
+            return coerce_to_type(old->type->stqs(), mk_NAME(made));
+        });
+        *t = normalize_tree(simp_tree(renamed, nullptr), nullptr);
+    }
+
     void update_records() {
         std::replace(loop->IV_syms.begin(), loop->IV_syms.end(), old, made);
         loop->record_of.erase(old);
@@ -236,8 +247,14 @@ private:
         iv->incrtree = mk_ICON(step, tp->int_t);
         iv->lowval = std::max(iv->lowval, int_type_min(type));
         iv->highval = std::min(iv->highval, int_type_max(type));
-        for (struct LOOP* l : loops_outer_first(loop))
+        for (struct LOOP* l : loops_outer_first(loop)) {
             if (l->RC_syms.erase(old)) l->RC_syms.insert(made);
+            if (l != loop) update_record(&l->trips);
+            for (NODE*& fact : l->givens) update_record(&fact);
+            for (const auto& of : l->IVs)
+                if (of.get() != iv)
+                    for (NODE** t : {&of->init, &of->last, &of->incrtree, &of->virtualInit}) update_record(t);
+        }
         for (struct LOOP* l = loop; l; l = l->parent) l->ALT_syms.insert(made);
     }
 

@@ -1,13 +1,11 @@
 """What documents list is what the code has: the tables of docs/ifile.md, and the steps of docs/passes.md."""
-import os
 import re
 import subprocess
-import tempfile
+import sys
 import unittest
 from pathlib import Path
 
 ROOT = Path(__file__).resolve().parents[2]
-ZOPT = Path(os.environ.get("ZOPT", ROOT / "build" / "zopt"))
 
 
 def text(path):
@@ -39,6 +37,25 @@ class Tables(unittest.TestCase):
         for head, prefix in ("| Class | Name | What it is |", "SC_"), ("| Qualifier | Name | What it says |", "CQ_"):
             wanted = {(number, name) for name, number in enumerators("OPT5/ir/symtab.h", prefix)}
             self.assertEqual(set(rows("docs/ifile.md", head)), wanted)
+
+
+class Pages(unittest.TestCase):
+    def test_each_step_has_its_paragraph_and_example(self):
+        page = text("docs/passes.md")
+        missing = {int(n) for first, last in re.findall(r"(\d+)(?:-(\d+))?", page.split("as they are: ")[1].split(".\n")[0])
+                   for n in range(int(first), int(last or first) + 1)}
+        for number, kind, name in re.findall(r'/\*\s*(\d+) \*/ \{(\w), "([^"]*)"', text("OPT5/driver/steps.cpp")):
+            self.assertEqual(kind == "L", int(number) in missing, name)
+            if kind != "L":
+                self.assertTrue(re.search(rf"(?m)^### .*\b{number} {re.escape(name)}", page), name)
+        done = subprocess.run([sys.executable, ROOT / "scripts" / "docs", "--check"], stderr=subprocess.PIPE, text=True)
+        self.assertEqual(done.returncode, 0, done.stderr)
+
+    def test_files_that_are_named_exist(self):
+        for page in [*(ROOT / "docs").glob("*.md"), ROOT / "README.md", ROOT / "CONTRIBUTING.md"]:
+            for name in re.findall(r"`((?:\w+/)+[\w-]+(?:\.\w+)?)`", page.read_text()):
+                if name.split("/")[0] != "build":
+                    self.assertTrue((ROOT / name).exists() or (ROOT / "OPT5" / name).exists(), f"{page.name}: {name}")
 
 
 if __name__ == "__main__":

@@ -149,7 +149,10 @@ void tell_of_pair(const REFERENCE& store, const REFERENCE& other, const DVE& d) 
 void tell_of_dependences(struct LOOP* loop, const PSN& place) {
     const std::vector<REFERENCE> references = references_of(loop);
     const auto is_store = [](const REFERENCE& r) { return r.is_write; };
-    if (references.size() > MOST_REFERENCES || std::none_of(references.begin(), references.end(), is_store)) return;
+    if (std::none_of(references.begin(), references.end(), is_store)) return;
+    if (references.size() > MOST_REFERENCES)
+        return remark("dependence", &place, REMARK::NOTE,
+                      std::to_string(references.size()) + " accesses to memory are too many to tell of each two");
     if (loop->has(LOOP_has_call))
         return remark("dependence", &place, REMARK::MISSED, "iterations stay in order: there is a call; see what is said of its inlining");
     size_t told = 0;

@@ -83,7 +83,10 @@ I_SYMTAB* OPT_CLIENT::cl_symbol_create(const char* name, TYPE* type, TYPE* secon
     if (sclass == SC_MEMORY27) {
         sym->sclass = SC_MEMORY;
         sym->flags = SC_MEMORY27;
-        if (currfuninfo && !file_level) set_flags(currfuninfo, FUN_cannot_beta | FUN_cannot_inline | FUN_cannot_suppress);
+        if (currfuninfo && !file_level) {
+            set_flags(currfuninfo, FUN_cannot_beta | FUN_cannot_suppress);
+            forbid_inlining(currfuninfo, "a local variable of it has to stay in its frame");
+        }
     }
     if (sym->type->is_func()) note_function_symbol(sym);
     sym_def(sym);
@@ -194,7 +197,11 @@ void OPT_CLIENT::apply_function_pragma(SYMTAB* sym, const PRAGMA& pragma) {
     switch (pragma.kind) {
     case PRG_FUNC_NEVER_RETURNS: set_flags(f, FUN_never_returns); break;
     case PRG_FUNC_CANNOT_INLINE:
-    case PRG_WEAK: set_flags(f, FUN_cannot_suppress | FUN_cannot_inline); break;
+    case PRG_WEAK:
+        set_flags(f, FUN_cannot_suppress);
+        forbid_inlining(f, pragma.kind == PRG_WEAK ? "it is weak, and another definition may take its place"
+                                                   : "#pragma FUNC_CANNOT_INLINE says so");
+        break;
     case PRG_FUNC_NO_GLOBAL_ASG: set_flags(f, FUN_no_global_asg); break;
     case PRG_FUNC_NO_IND_ASG: set_flags(f, FUN_no_ind_asg); break;
     case PRG_FUNC_IS_PURE: set_flags(f, FUN_is_pure_fun); break;
@@ -210,14 +217,20 @@ void OPT_CLIENT::apply_function_pragma(SYMTAB* sym, const PRAGMA& pragma) {
         break;
     case PRG_SYM_VISIBILITY: {
         const bool open = first_arg_is(pragma, "default") || first_arg_is(pragma, "extern");
-        if (open) set_flags(f, FUN_is_referenced | FUN_cannot_inline);
+        if (open) {
+            set_flags(f, FUN_is_referenced);
+            forbid_inlining(f, "it is visible outside, where another definition may take its place");
+        }
         if (!open && !first_arg_is(pragma, "protected")) break;
         set_flags(f, FUN_is_cg_root | FUN_cannot_beta | FUN_is_referenced | FUN_cannot_suppress);
         no_outside_callers = 0;
         break;
     }
     case PRG_FUNC_ESPEC:
-        if (pragma.args.size() < 2 || pragma.args[1] != "0") set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
+        if (pragma.args.size() < 2 || pragma.args[1] != "0") {
+            set_flags(f, FUN_cannot_suppress);
+            forbid_inlining(f, "it has an exception specification");
+        }
         break;
     case PRG_FUNC_SYNONYM: note_synonym(f, pragma); break;
     default: break;

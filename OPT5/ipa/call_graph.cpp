@@ -138,8 +138,10 @@ void settle_root(FUNINFO* f) {
     if ((!returns_void && TEST_FLAG(f, FUN_is_cg_root | FUN_is_anonymous)) || is_special)
         set_flags(f, FUN_value_needed);
     if (!(f->symbol->cqual & CQ_INLINE))
-        if (TEST_FLAG(f, FUN_is_main | FUN_is_interrupt) || (returns_void && TEST_FLAG(f, FUN_value_needed)))
-            set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
+        if (TEST_FLAG(f, FUN_is_main | FUN_is_interrupt) || (returns_void && TEST_FLAG(f, FUN_value_needed))) {
+            set_flags(f, FUN_cannot_suppress);
+            forbid_inlining(f, "it is main, an interrupt function, or has no value where one is used");
+        }
     if (TEST_FLAG(f, FUN_is_cg_root)) add_call_edge(program.file_fun, f, false);
     if (TEST_FLAG(f, FUN_is_anonymous)) add_call_edge(program.file_fun, f, false);
     if (TEST_FLAG(f, FUN_is_cg_root | FUN_is_anonymous)) {

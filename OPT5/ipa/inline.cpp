@@ -142,9 +142,12 @@ const char* help_for(const CALLSITE& site, const std::string& reason) {
     if (reason == "no inlining conditions apply")
         return opt_level() < 3 ? "declare it inline, or optimize at level 3"
                                : "it is larger than --auto_inline allows: declare it inline, or #pragma FUNC_ALWAYS_INLINE";
-    if (reason == "cannot-inline or never-returns") return "it never returns, #pragma FUNC_CANNOT_INLINE, or its body cannot be copied";
+    if (reason == "cannot-inline or never-returns")
+        return site.callee->inline_obstacle ? site.callee->inline_obstacle : "it never returns";
     if (reason == "fun-follows-call auto-inline") return "it calls its caller, or itself: declare it inline";
-    if (reason == "varargs or body problems") return "it takes a variable number of arguments, or has no body to copy";
+    if (reason == "varargs or body problems")
+        return site.callee->symbol->type->getr(TYPE::tpk_func)->vararg() ? "it takes a variable number of arguments"
+                                                                         : "it has no body to copy";
     return "NOINLINE, recursion, or arguments that its parameters do not take";
 }
 

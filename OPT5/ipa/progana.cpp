@@ -59,8 +59,14 @@ void check_integrable_definition() {
     bool may = true;
     for (const SYMTAB* list : {f->new_syms, f->pending_syms, f->scalar_syms, f->memory_syms})
         for (const SYMTAB* s = list; s && may; s = s->next) may = may_be_copied(s, &wide);
-    if (needs_its_own_frame(f)) may = false;
-    if (!may || (!asked_for && wide > WIDE_LOCALS_LIMIT)) set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
+    const bool is_too_wide = !asked_for && wide > WIDE_LOCALS_LIMIT;
+    const char* const obstacle = needs_its_own_frame(f) ? "it speaks of its own frame, as setjmp and alloca do"
+                                 : !may                 ? "it has a volatile variable, or one that stays where its caller puts it"
+                                 : is_too_wide          ? "it has many or large local variables: declare it inline"
+                                                        : nullptr;
+    if (!obstacle) return;
+    set_flags(f, FUN_cannot_suppress);
+    forbid_inlining(f, obstacle);
 }
 
 // Symbols are laid out in groups on targets that address them from one base; this one has no groups.

@@ -256,7 +256,10 @@ private:
             return;
         }
         if (t->op == ASM && t->text) program.assembly.push_back(t->text);
-        if (!f->symbol || !(f->symbol->cqual & CQ_INLINE)) set_flags(f, FUN_cannot_suppress | FUN_cannot_inline);
+        if (!f->symbol || !(f->symbol->cqual & CQ_INLINE)) {
+            set_flags(f, FUN_cannot_suppress);
+            forbid_inlining(f, "it holds inline assembly: declare it inline if that may be copied");
+        }
         clear(ASSUMPTIONS | FUN_only_reads);
         operands(t);
     }

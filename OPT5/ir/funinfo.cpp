@@ -56,6 +56,10 @@ bool setjmp_is_named = false;
 
 uint64_t get_flags(FUNINFO* f) { return f->flags; }
 void set_flags(FUNINFO* f, uint64_t bits) { f->flags |= bits; }
+void forbid_inlining(FUNINFO* f, const char* why) {
+    set_flags(f, FUN_cannot_inline);
+    if (!f->inline_obstacle) f->inline_obstacle = why;
+}
 void clear_flags(FUNINFO* f, uint64_t bits) { f->flags &= ~bits; }
 
 bool is_system_function(const char* name) { return system_functions().count(skip_name_prefix(name)) != 0; }

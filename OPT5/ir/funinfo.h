@@ -109,6 +109,7 @@ public:
     SYMTAB* symbol = nullptr; // null for a function known by name alone and for the dummy
     uint32_t uid = 0;
     std::string name; // with the language prefix
+    const char* inline_obstacle = nullptr; // why FUN_cannot_inline is set
     SYMLIST* fl_statics = nullptr;
     CALLEE* callees = nullptr;
     TYPE* return_type = nullptr;
@@ -205,6 +206,8 @@ private:
 
 uint64_t get_flags(FUNINFO* f);
 void set_flags(FUNINFO* f, uint64_t bits);
+// Its body is not copied into callers; `why` (lasting) is what the programmer is told, and the first reason stays.
+void forbid_inlining(FUNINFO* f, const char* why);
 void clear_flags(FUNINFO* f, uint64_t bits);
 inline bool TEST_FLAG(FUNINFO* f, uint64_t bits) { return (get_flags(f) & bits) != 0; }
 

@@ -50,7 +50,8 @@ void g(int *p, int *q, int n) { int i;
     for (i = 0; i < 31; i++)
         x[i + 1] = x[i] + i;  // note    dependence: .*'x\\[i \\+ 1\\]' .*'x\\[i\\]' .*1 apart
     for (i = 0; i < 32; i++) y[i] = 3; }  // done    dependence: no access
-int main(void) { x[0] = 1; g(x, y, 5); x[5] = 7;
+static int v(int n) { volatile int m = n; return m; }
+int main(void) { x[0] = 1; g(x, y, 5); x[5] = v(7);  // missed  inline: v\\(\\) is not expanded: it has a volatile variable
     put_i16(f(5)); put_i16(pair(x)); return 0; }  // done    inline: pair\\(\\) is expanded here; missed  inline: f\\(\\)
 """
 

@@ -32,6 +32,8 @@ void tell_of_loops(struct LOOP* root);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
 bool sink_unused_definitions(struct LOOP* loop);
+// Places that innermost loops write, and whose address stays, get pointers of their own (invariant_places.cpp).
+void name_invariant_places(struct LOOP* root);
 void undeltafy_dd_loops(struct LOOP* loop);
 void collapse_dd_loops(struct LOOP* loop);
 void coalesce_dd_loops(struct LOOP* loop);

@@ -7,7 +7,6 @@
 #include "OPT5/dd/dependence.h"
 #include "OPT5/dd/inductions.h"
 #include "OPT5/dd/loop.h"
-#include "OPT5/dd/ssa.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/remark.h"
 #include "OPT5/ir/trees.h"
@@ -20,23 +19,6 @@
 namespace {
 
 constexpr size_t MOST_REFERENCES = 40, MOST_TOLD = 3;
-
-// A global has an underscore ahead of its name in C.
-std::string variable_text(const NODE* name) {
-    const std::string text = tree_to_infix(name);
-    return name->u.sym->level == 0 && text.compare(0, 1, "_") == 0 ? text.substr(1) : text;
-}
-
-// Of *address.
-std::string text_behind(const NODE* address) {
-    while (address->op == PCONV) address = address->left;
-    const auto object = [](const NODE* t) { return t->op == UAND && t->left->op == NAME ? t->left : t->op == NAME ? t : nullptr; };
-    const bool is_sum = address->op == PLUS;
-    const NODE* base = object(is_sum ? address->left : address);
-    if (!base) return "";
-    if (is_sum) return variable_text(base) + "[" + tree_to_infix(address->right) + "]";
-    return address->op == UAND ? variable_text(base) + "[0]" : "*" + variable_text(base);
-}
 
 PSN place_of(const struct LOOP* loop) {
     const SOURCE_PLACE& start = loop->sourceStart;
@@ -175,14 +157,6 @@ void tell_of_dependences(struct LOOP* loop, const PSN& place) {
 }
 
 } // namespace
-
-std::string reference_text(const NODE* tree) {
-    NODE* t = denormalize_tree(copy_dd_tree_removing_SSA_operators(tree), false);
-    std::string text = t->op == UMULT ? text_behind(t->left) : t->op == NAME ? variable_text(t) : "";
-    if (text.empty()) text = tree_to_infix(t);
-    erase_tree(t);
-    return text;
-}
 
 void tell_of_loops(struct LOOP* root) {
     if (!root || !remarks_are_wanted) return;

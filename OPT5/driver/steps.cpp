@@ -170,6 +170,11 @@ void with_hierarchy(F work) {
     if (root()) work();
 }
 
+void promote_in_loops() {
+    if (!pass_debug_bare_SSA) with_hierarchy([] { name_invariant_places(root()); });
+    promote_to_registers(false);
+}
+
 void DMAC_conversion() {
     if (special_DMAC_conversion()) drop_hierarchy();
 }
@@ -258,7 +263,7 @@ const ROW steps[] = {
     /* 30 */ {F, "SSA_NASSERTs", &N_and_S, L2_with_assertions, clone_SSA_NASSERTs, none, every},
     /* 31 */ {F, "SSA_propagate", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
     /* 32 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},
-    /* 33 */ {F, "SSA_reg_promote", &N, L2, [] { promote_to_registers(false); }, none, graph | alias_marks},
+    /* 33 */ {F, "SSA_reg_promote", &N, L2, promote_in_loops, none, graph | alias_marks},
     /* 34 */ {F, "loop_assertions", &D, L2_with_loops, [] { with_hierarchy([] { find_loop_assertions(nullptr); }); }, none, graph | alias_marks},
     /* 35 */ {F, "sink_unused_definitions", &D, L2_with_loops, [] { with_hierarchy(sink_definitions); }, none, graph | alias_marks},
     /* 36 */ {L, "undeltafy", &D, L2, [] { undeltafy_dd_loops(root()); }, none, none},

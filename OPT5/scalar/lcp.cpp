@@ -1,23 +1,25 @@
 // Copies and constants in place of the variables and places that hold them.
 //
 // Two lists of assignments are asked for each read. The local one holds what the statements of a chain of blocks have
-// assigned (local_asgs.cpp). The global one holds assignments of constants and copies to variables that have no other
-// assignment in the function.
+// assigned (local_asgs.cpp), and, in the late mode, what every path to the chain has assigned and not changed since. The
+// global one holds assignments of constants and copies to variables that have no other assignment in the function.
 //
 // Needs: alias marks, pointees, pointer groups; dominators where there are global assignments. Leaves: a simplified graph
 // with block numbers where anything was replaced. The assignments stay, for who removes dead ones.
-// Sound, for the local list, because it is emptied at each block that control may enter from elsewhere than the block just
-// walked. For the global one, because the only assignment of x dominates the read, and the only assignment of y in `x = y`
+// Sound, for the local list, because at each block that control may enter from elsewhere than the block just walked it is
+// emptied but for what holds at the end of every block ahead of it. For the global one, because the only assignment of x dominates the read, and the only assignment of y in `x = y`
 // dominates that: were y assigned again between the two, the same path from there on would come to the read without `x =
 // y`. Only variables take part that nothing but their NAME reaches, and that live in one call alone.
 #include "OPT5/scalar/lcp.h"
 
 #include "OPT5/alias/effects.h"
+#include "OPT5/ir/dataflow.h"
 #include "OPT5/ir/dominator.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/rewrite_limit.h"
+#include "OPT5/ir/side_table.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -26,6 +28,7 @@
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 
+#include <optional>
 #include <unordered_map>
 #include <vector>
 
@@ -167,6 +170,70 @@ bool GLOBAL_ASGS::statement(LIST* s, const BBLK* bb, int position) {
     return any;
 }
 
+// ---- Assignments that hold on every path
+
+// Copies and constants: `x = y` holds behind it until one of the two is written. A statement that may be left in its middle
+// may have written or not: it makes nothing hold, and ends what it may write.
+class AVAILABLE_ASGS {
+public:
+    static constexpr size_t MOST = 256; // those that follow are not looked at
+
+    AVAILABLE_ASGS() {
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+            for (const LIST* s = bb->statements; s; s = s->rest) collect(s->first);
+        if (asgs.empty()) return;
+        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) summarize(bb);
+        flow.emplace(FLOW::FORWARD, MEET::INTERSECTION, none(), [this](const BBLK* bb, BITVEC& set) {
+            set -= ended[bb];
+            set |= made[bb];
+        });
+        for (const NODE* asg : asgs) copies.push_back(copy_tree(asg)); // the walk changes statements
+    }
+    AVAILABLE_ASGS(const AVAILABLE_ASGS&) = delete;
+    AVAILABLE_ASGS& operator=(const AVAILABLE_ASGS&) = delete;
+    ~AVAILABLE_ASGS() {
+        for (NODE* copy : copies) erase_tree(copy);
+    }
+    void assume_at_entry(const BBLK* bb, LOCAL_ASGS& known) const {
+        if (!flow) return;
+        const BITVEC& set = flow->at_entry(bb);
+        for (uint32_t i = set.next_set(0); i < set.bits; i = set.next_set(i + 1)) known.assume(copies[i]);
+    }
+
+private:
+    BITVEC none() const { return BITVEC(static_cast<uint32_t>(asgs.size())); }
+
+    static bool is_copy(const NODE* t) {
+        if (t->op != ASG || !is_private_name(t->left)) return false;
+        return t->right->op == ICON || (is_private_name(t->right) && t->right->u.sym != t->left->u.sym);
+    }
+    void collect(const NODE* t) {
+        if (!is_copy(t) || asgs.size() == MOST) return;
+        const auto number = static_cast<uint32_t>(asgs.size());
+        of_variable[t->left->u.sym].push_back(number);
+        if (t->right->op == NAME) of_variable[t->right->u.sym].push_back(number);
+        asgs.push_back(t);
+    }
+    void summarize(const BBLK* bb) {
+        BITVEC &in = made[bb] = none(), &out = ended[bb] = none();
+        for (const LIST* s = bb->statements; s; s = s->rest) {
+            for_each_written_name(s->first, [&](const NODE* name, const NODE*) {
+                const auto found = of_variable.find(name->u.sym);
+                if (found == of_variable.end()) return;
+                for (uint32_t i : found->second) in.clear(i), out.set(i);
+            });
+            if (next < asgs.size() && asgs[next] == s->first) in.set(static_cast<uint32_t>(next++));
+        }
+    }
+
+    std::vector<const NODE*> asgs; // in the order of blocks and statements, before the walk
+    std::vector<NODE*> copies;
+    size_t next = 0;
+    std::unordered_map<const SYMTAB*, std::vector<uint32_t>> of_variable; // looked up alone
+    SIDE_TABLE<BITVEC> made, ended;
+    std::optional<DATAFLOW> flow;
+};
+
 // ---- The walk
 
 bool walk_global_asgs() {
@@ -181,13 +248,16 @@ bool walk_global_asgs() {
     return any;
 }
 
-bool walk_local_asgs(unsigned kinds) {
+bool walk_local_asgs(unsigned kinds, const AVAILABLE_ASGS* available = nullptr) {
     LOCAL_ASGS known(kinds);
     const BBLK* last = nullptr; // the block just walked
     bool any = false;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
         const EDGE* before = bb->predecessors;
-        if (!last || !before || before->rest || before->first != last) known.restart();
+        if (!last || !before || before->rest || before->first != last) {
+            known.restart();
+            if (available) available->assume_at_entry(bb, known);
+        }
         last = bb->is_in_LIR_form() ? nullptr : bb;
         if (!last) continue;
         walk_block(known, bb, &any);
@@ -207,7 +277,9 @@ void copyprop(int mode) {
                 if (s->first->op == COMMAOP) promote_toplevel_COMMAOPs_in_list(s, s->rest);
         need(fact::alias);
         bool any = mode != 0 && walk_global_asgs();
-        any |= walk_local_asgs(ASGS_TO_NAMES | ASGS_TO_PARTS | (mode == 2 ? +ASGS_KEEP_TESTS : 0u));
+        std::optional<AVAILABLE_ASGS> available;
+        if (mode == 1) available.emplace();
+        any |= walk_local_asgs(ASGS_TO_NAMES | ASGS_TO_PARTS | (mode == 2 ? +ASGS_KEEP_TESTS : 0u), available ? &*available : nullptr);
         if (!any) return;
         changed(fact::graph);
         simpcfg(0, 0);

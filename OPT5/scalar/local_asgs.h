@@ -34,6 +34,7 @@ public:
     ~LOCAL_ASGS() { restart(); }
 
     void restart(); // nothing is known
+    void assume(const NODE* asg) { learn(asg); } // x = 3 or x = y, which holds here
     // The next statement of the chain: its reads, then what it makes known. True if it was changed; the cell is left empty
     // where nothing of it remains.
     bool statement(LIST* s);

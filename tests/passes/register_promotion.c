@@ -211,6 +211,43 @@ int constant(int n, int *p) {
     return s;
 }
 
+// A place whose address stays in the loop; nothing else there can be it.
+long sums[4][4];
+// FUNCTION: rows_of_sums
+// HAS: /\$O\$v\d+ \+= \(long\)\*.*/
+// HAS: /\*.* = \$O\$v\d+/
+void rows_of_sums(int n) {
+    int i, j, k;
+    for (i = 0; i < 4; i++)
+        for (j = 0; j < 4; j++)
+            for (k = 0; k < n; k++) sums[i][j] += a[k ^ j];
+}
+
+// Other accesses of the loop may be the place, or make its address another one.
+int met_in_the_loop(int *p, int i, int n) {
+    int k, *q = a + i, s = 0;
+    for (k = 0; k < n; k++) a[i + 1] += p[k], s += q[k];
+    for (k = 0; k < n; k++) a[h & 7] += k, h += k & 1;
+    for (k = 0; k < n; k++)
+        if (p[k] > 3) a[i] = k + a[i]; // stored in some iterations
+    return s;
+}
+
+// On both paths to the sum `copy` is what `n` is, until one is changed.
+// FUNCTION: copied
+// NOT: copy *
+int copied(int n, int m, int *p) {
+    int copy = n;
+    if (m > 3) {
+        p[0] = copy * 2;
+        n = p[1];
+        copy = n;
+    }
+    p[2] += copy * n;
+    if (m > 5) n = p[3];
+    return copy - n;
+}
+
 int main(void) {
     struct cell c[3] = {{1, c + 1}, {2, c + 2}, {3, 0}};
     int i, zeros[4] = {0};
@@ -233,6 +270,10 @@ int main(void) {
     put_i16(two_entries(4) + two_entries(5) + h);
     put_i16(many_exits(6) + many_exits(2000) + many_exits(5) + g);
     put_i16(constant(3, &i) + constant(0, 0));
+    rows_of_sums(5), rows_of_sums(0);
+    put_i32(sums[1][2] + sums[3][0] * 7);
+    put_i16(met_in_the_loop(a, 2, 6) + a[3] + a[2] + h);
+    put_i16(copied(4, 1, a) + copied(5, 9, a) * 3 + a[2]);
     within_endless_loop();
     return 0;
 }

@@ -27,9 +27,10 @@ constexpr int TROUBLE = 2;
 
 class REDUCER {
 public:
-    REDUCER(IC_UNIT& reduced, std::string out_file, std::vector<std::string> command_words, long most)
+    REDUCER(IC_UNIT& reduced, std::string out_file, std::vector<std::string> command_words, long most,
+            long seconds_each)
         : unit(reduced), out(std::move(out_file)), trial(out + ".trial"), command(std::move(command_words)),
-          steps_left(most) {}
+          steps_left(most), seconds(seconds_each) {}
 
     int run();
 
@@ -55,6 +56,7 @@ private:
     const std::string out, trial;
     const std::vector<std::string> command;
     long steps_left;
+    const long seconds;
     int wanted = 0;
 };
 
@@ -78,6 +80,7 @@ bool REDUCER::write(const std::string& path) const {
 
 int REDUCER::status_of(const std::string& path) const {
     std::vector<std::string> words = command;
+    words.insert(words.begin(), {"timeout", "--kill-after=1", std::to_string(seconds)}); // with all that it starts
     bool is_named = false;
     for (std::string& word : words)
         for (size_t at = word.find("{}"); at != std::string::npos; at = word.find("{}", at + path.size())) {
@@ -281,9 +284,10 @@ int REDUCER::run() {
 }
 
 int usage(FILE* out) {
-    std::fprintf(out, "usage: zreduce [--steps N] IN OUT -- COMMAND [WORD]...\n"
+    std::fprintf(out, "usage: zreduce [--steps N] [--seconds N] IN OUT -- COMMAND [WORD]...\n"
                       "  makes the I-file smaller while the command, with {} for the file, keeps its status\n"
-                      "  --steps N   trials at most (100000)\n");
+                      "  --steps N     trials at most (100000)\n"
+                      "  --seconds N   for each, after which the command is ended and has status 124 (20)\n");
     return out == stdout ? 0 : TROUBLE;
 }
 
@@ -292,12 +296,12 @@ int usage(FILE* out) {
 int main(int argc, char** argv) {
     std::vector<std::string> words(argv + 1, argv + argc);
     if (words.size() == 1 && words[0] == "--help") return usage(stdout);
-    long most = 100000;
-    if (words.size() > 1 && words[0] == "--steps") {
-        most = std::strtol(words[1].c_str(), nullptr, 10);
+    long most = 100000, seconds = 20;
+    while (words.size() > 1 && (words[0] == "--steps" || words[0] == "--seconds")) {
+        (words[0] == "--steps" ? most : seconds) = std::strtol(words[1].c_str(), nullptr, 10);
         words.erase(words.begin(), words.begin() + 2);
     }
-    if (words.size() < 4 || words[2] != "--" || most <= 0) return usage(stderr);
+    if (words.size() < 4 || words[2] != "--" || most <= 0 || seconds <= 0) return usage(stderr);
     FILE* const in = std::fopen(words[0].c_str(), "rb");
     if (!in) {
         std::fprintf(stderr, "zreduce: %s cannot be opened\n", words[0].c_str());
@@ -306,7 +310,7 @@ int main(int argc, char** argv) {
     try {
         IC_UNIT unit;
         unit.read(in, ic_type_package());
-        return REDUCER(unit, words[1], {words.begin() + 3, words.end()}, most).run();
+        return REDUCER(unit, words[1], {words.begin() + 3, words.end()}, most, seconds).run();
     } catch (const std::exception& error) {
         std::fprintf(stderr, "zreduce: %s: %s\n", words[0].c_str(), error.what());
         return TROUBLE;

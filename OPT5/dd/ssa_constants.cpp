@@ -348,6 +348,7 @@ private:
         if (compatible_types(value->type, type, true) && calculate_bounds(value, loop, &min, &max) &&
             (min > int_type_min(type) || max < int_type_max(type))) {
             temp = sym_temp('y', -1, type, asg->left->ls);
+            for (struct LOOP* l = loop; l; l = l->parent) make_sym_altered_in_loop(temp, l);
             make_widened_symbol_entry(temp, type, max, min, find_known_zeros(value, type), find_known_ones(value, type));
         }
         erase_tree(value);

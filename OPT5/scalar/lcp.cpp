@@ -180,24 +180,24 @@ public:
 
     AVAILABLE_ASGS() {
         for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            for (const LIST* s = bb->statements; s; s = s->rest) collect(s->first);
+            for (const LIST* s = bb->statements; s; s = s->rest)
+                if (is_copy(s->first) && !number_of(s->first) && asgs.size() < MOST) enter(s->first);
         if (asgs.empty()) return;
         for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) summarize(bb);
         flow.emplace(FLOW::FORWARD, MEET::INTERSECTION, none(), [this](const BBLK* bb, BITVEC& set) {
             set -= ended[bb];
             set |= made[bb];
         });
-        for (const NODE* asg : asgs) copies.push_back(copy_tree(asg)); // the walk changes statements
     }
     AVAILABLE_ASGS(const AVAILABLE_ASGS&) = delete;
     AVAILABLE_ASGS& operator=(const AVAILABLE_ASGS&) = delete;
     ~AVAILABLE_ASGS() {
-        for (NODE* copy : copies) erase_tree(copy);
+        for (NODE* asg : asgs) erase_tree(asg);
     }
     void assume_at_entry(const BBLK* bb, LOCAL_ASGS& known) const {
         if (!flow) return;
         const BITVEC& set = flow->at_entry(bb);
-        for (uint32_t i = set.next_set(0); i < set.bits; i = set.next_set(i + 1)) known.assume(copies[i]);
+        for (uint32_t i = set.next_set(0); i < set.bits; i = set.next_set(i + 1)) known.assume(asgs[i]);
     }
 
 private:
@@ -207,12 +207,19 @@ private:
         if (t->op != ASG || !is_private_name(t->left)) return false;
         return t->right->op == ICON || (is_private_name(t->right) && t->right->u.sym != t->left->u.sym);
     }
-    void collect(const NODE* t) {
-        if (!is_copy(t) || asgs.size() == MOST) return;
+    // Of an assignment that says the same, from wherever.
+    std::optional<uint32_t> number_of(const NODE* t) const {
+        const auto found = of_variable.find(t->left->u.sym);
+        if (found != of_variable.end())
+            for (uint32_t i : found->second)
+                if (asgs[i]->left->u.sym == t->left->u.sym && trees_are_congruent(asgs[i]->right, t->right, false)) return i;
+        return {};
+    }
+    void enter(const NODE* t) {
         const auto number = static_cast<uint32_t>(asgs.size());
         of_variable[t->left->u.sym].push_back(number);
         if (t->right->op == NAME) of_variable[t->right->u.sym].push_back(number);
-        asgs.push_back(t);
+        asgs.push_back(copy_tree(t)); // the walk changes statements
     }
     void summarize(const BBLK* bb) {
         BITVEC &in = made[bb] = none(), &out = ended[bb] = none();
@@ -222,13 +229,12 @@ private:
                 if (found == of_variable.end()) return;
                 for (uint32_t i : found->second) in.clear(i), out.set(i);
             });
-            if (next < asgs.size() && asgs[next] == s->first) in.set(static_cast<uint32_t>(next++));
+            if (!is_copy(s->first)) continue;
+            if (const auto number = number_of(s->first)) in.set(*number);
         }
     }
 
-    std::vector<const NODE*> asgs; // in the order of blocks and statements, before the walk
-    std::vector<NODE*> copies;
-    size_t next = 0;
+    std::vector<NODE*> asgs;
     std::unordered_map<const SYMTAB*, std::vector<uint32_t>> of_variable; // looked up alone
     SIDE_TABLE<BITVEC> made, ended;
     std::optional<DATAFLOW> flow;

@@ -233,6 +233,16 @@ int met_in_the_loop(int *p, int i, int n) {
     return s;
 }
 
+// The bounds of what is counted are known, so that it has a variable of its own, which each iteration sets.
+unsigned bins[16];
+void counted(int n) {
+    int i;
+    for (i = 0; i < n; i++) {
+        int b = (a[i] >> 2) + 8;
+        bins[b < 0 ? 0 : b >= 16 ? 15 : b]++;
+    }
+}
+
 // On both paths to the sum `copy` is what `n` is, until one is changed.
 // FUNCTION: copied
 // NOT: copy *
@@ -273,6 +283,8 @@ int main(void) {
     rows_of_sums(5), rows_of_sums(0);
     put_i32(sums[1][2] + sums[3][0] * 7);
     put_i16(met_in_the_loop(a, 2, 6) + a[3] + a[2] + h);
+    counted(16), counted(0);
+    for (i = 0; i < 16; i++) put_i16((int)bins[i]);
     put_i16(copied(4, 1, a) + copied(5, 9, a) * 3 + a[2]);
     within_endless_loop();
     return 0;

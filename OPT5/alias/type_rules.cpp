@@ -75,7 +75,9 @@ TYPE* declared_pointee(const NODE* p) {
             break;
         case NAME: {
             const SYMTAB* sym = p->u.sym;
-            if (!sym || sym->is_temp || !sym->orig_type || !sym->orig_type->is_pointer()) return nullptr;
+            // Temporaries of an earlier run have the type of their first access for a declared one.
+            if (!sym || sym->is_temp || is_internal_symbol(sym)) return nullptr;
+            if (!sym->orig_type || !sym->orig_type->is_pointer()) return nullptr;
             return sym->orig_type->type_pointed_to();
         }
         case STDOT:

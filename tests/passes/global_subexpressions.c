@@ -200,6 +200,18 @@ int closed_by_its_test(int k) {
     return hits + *p;
 }
 
+// Of an output that is optimized once more: the pointer's name tells that nobody declared what it points to.
+short shorts[16];
+unsigned stepped_once_more(short *first) {
+    int *$O$P3 = (int *)(first + 1), *$O$P4 = (int *)(first + 11);
+    do {
+        unsigned read = (unsigned)first[3] << 2;
+        *$O$P3 = (int)(read + $O$P3[1]);
+        $O$P3 += 1;
+    } while ($O$P3 != $O$P4);
+    return (unsigned)first[8];
+}
+
 int main(void) {
     struct S s = {1, {2, 3, 4}}, t = {5, {6, 7, 8}};
     int c;
@@ -224,5 +236,7 @@ int main(void) {
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));
+    for (c = 0; c < 16; c++) shorts[c] = (short)(c * 3 + 1);
+    put_u16(stepped_once_more(shorts));
     return 0;
 }

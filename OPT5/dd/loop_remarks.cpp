@@ -39,9 +39,12 @@ std::string count_of(const struct LOOP* loop) {
     if (loop->trips && loop->trips->op == ICON) return number(loop->trips, "") + " iterations";
     const std::string least = number(loop->minTrips, "0"), most = number(loop->maxTrips, ""),
                       factor = number(loop->tripFactor, "1");
-    std::string text = (loop->trips ? reference_text(loop->trips) + " iterations, " : "") + least;
+    // A temporary says nothing to the programmer.
+    const std::string trips = loop->trips ? reference_text(loop->trips) : "$";
+    const bool is_shown = trips.find('$') == std::string::npos;
+    std::string text = (is_shown ? trips + " iterations, " : "") + least;
     text += most.empty() ? " or more" : least == most ? "" : " to " + most;
-    if (!loop->trips) text += " iterations";
+    if (!is_shown) text += " iterations";
     return factor == "1" ? text : text + ", a multiple of " + factor;
 }
 

@@ -5,6 +5,7 @@
 #include "OPT5/ir/list.h"
 
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 // Where a tracked reference, or something that may write, stands in its tree. In the order of evaluation within a
@@ -23,6 +24,8 @@ struct SSA_SITE {
 struct SSA_BUILD {
     bool onlySSV = false, onlyIV = false, vectorsToo = false, onlyMemory = false;
     size_t left_bare = 0; // references to registers that are not tracked
+    // Local structures and the like that are accessed at places which the trees do not show: memory, as what pointers reach.
+    std::unordered_set<const SYMTAB*> indexed; // membership only
     std::vector<SSA_SITE> sites;
     std::vector<size_t> first_site; // by the number of the block, which is what ends the sites of the block before it
     std::vector<BBLK*> blocks;      // by number from 1
@@ -45,6 +48,8 @@ struct SSA_PLACE {
     SYMTAB* pointer = nullptr;
     INT65 start, length;
 };
+// What every write that is no definition is asked about.
+bool is_SSA_memory(const SYMTAB* sym, const SSA_BUILD& build);
 // False where the tree does not show a fixed place.
 bool find_SSA_place(const NODE* lvalue, SSA_PLACE* place);
 // Of a local scalar as a whole, which could be tracked, and nothing but its name reaches: a SSAVAR_likely_register's.
@@ -90,6 +95,7 @@ private:
                      const std::vector<SSAVAR*>& live_memory);
     bool may_meet(const NODE* write, const NODE* place, const SSAVAR* written, const SSAVAR* v);
 
+    const SSA_BUILD& build;
     std::vector<SSAVAR*> found;
     std::vector<uint32_t> stamp; // by uid: the site that found it
     uint32_t now = 0;

@@ -18,8 +18,6 @@
 
 namespace {
 
-bool is_memory(const SYMTAB* sym) { return !sym->is_automatic() || may_be_reached_by_pointers(sym); }
-
 bool is_access(int op) { return op == NAME || op == UMULT || op == STDOT || op == STREF; }
 
 // Other than as the root of a statement.
@@ -80,7 +78,7 @@ private:
 void WRAPPER::note_untracked(const NODE* lvalue) {
     const NODE* name = name_of_place(lvalue);
     const SYMTAB* sym = name ? name->u.sym : object_name_if_known(lvalue);
-    if (sym && !sym->is_function() && !is_memory(sym)) refuse(sym);
+    if (sym && !sym->is_function() && !is_SSA_memory(sym, build)) refuse(sym);
 }
 
 void WRAPPER::operands_of_place(NODE** link) {
@@ -200,7 +198,31 @@ void WRAPPER::give_up_refused() {
 
 } // namespace
 
+namespace {
+
+bool has_local_structures() {
+    for (const SYMTAB* list : {currfuninfo->new_syms, currfuninfo->pending_syms, currfuninfo->memory_syms})
+        for (const SYMTAB* s = list; s; s = s->next)
+            if (s->type->is_csu()) return true;
+    return false;
+}
+
+void find_indexed_objects(SSA_BUILD& build) {
+    if (!has_local_structures()) return;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            for_each_subtree(static_cast<const NODE*>(s->first), [&build](const NODE* t) {
+                SSA_PLACE place;
+                if (t->op != UMULT || t->left->op == NAME || find_SSA_place(t, &place)) return;
+                const SYMTAB* sym = object_name_if_known(t);
+                if (sym && sym->is_automatic() && sym->type->is_csu()) build.indexed.insert(sym);
+            });
+}
+
+} // namespace
+
 void wrap_SSA_references(SSA_BUILD& build) {
+    find_indexed_objects(build);
     WRAPPER wrapper(build);
     for (const EHT_ITEM& item : currfuninfo->eht)
         for_each_subtree(static_cast<const NODE*>(item.cleanup), [&wrapper](const NODE* t) {
@@ -226,10 +248,10 @@ void wrap_SSA_references(SSA_BUILD& build) {
 
 // ---- Changes
 
-SSA_CHANGES::SSA_CHANGES(const SSA_BUILD& build)
-    : stamp(ssa_state.variables.size(), 0),
+SSA_CHANGES::SSA_CHANGES(const SSA_BUILD& form)
+    : build(form), stamp(ssa_state.variables.size(), 0),
       // Beyond that every answer is "may": time stays linear.
-      questions_left(100000 + 64 * build.references()) {}
+      questions_left(100000 + 64 * form.references()) {}
 
 void SSA_CHANGES::add(SSAVAR* v) {
     if (stamp[v->uid] == now) return;
@@ -289,7 +311,7 @@ void SSA_CHANGES::find(const SSA_SITE& site, const std::vector<SSAVAR*>& live_me
                 if (!v->has(SSAVAR_munged) && (!v->is_memory() || may_meet(w.by, place, nullptr, v))) add(v);
             });
             add_what_is_behind(sym);
-            if (!is_memory(sym)) return;
+            if (!is_SSA_memory(sym, build)) return;
         }
         add_aliases(w.by, place, nullptr, live_memory);
     });

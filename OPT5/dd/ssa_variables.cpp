@@ -89,7 +89,7 @@ bool is_same_entry(const SSAVAR* v, const SSA_PLACE& place, const NODE* lvalue) 
     return v->start == place.start && v->length == place.length && compatible_types(v->tree->type, lvalue->type, false);
 }
 
-SSAVAR* make_entry(const SSA_PLACE& place, const NODE* lvalue, SSAVAR*& first) {
+SSAVAR* make_entry(const SSA_PLACE& place, const NODE* lvalue, const SSA_BUILD& build, SSAVAR*& first) {
     auto made = std::make_unique<SSAVAR>(static_cast<uint32_t>(ssa_state.variables.size()));
     SSAVAR* v = made.get();
     ssa_state.variables.push_back(std::move(made));
@@ -99,6 +99,7 @@ SSAVAR* make_entry(const SSA_PLACE& place, const NODE* lvalue, SSAVAR*& first) {
     v->length = place.length;
     v->tree = copy_tree_removing_SSA_operators(lvalue);
     set_SSAVAR_flags(v);
+    if (place.sym && build.indexed.count(place.sym)) v->flags |= SSAVAR_aliased;
     if (first) {
         v->ring = first->ring;
         first->ring = v;
@@ -108,6 +109,10 @@ SSAVAR* make_entry(const SSA_PLACE& place, const NODE* lvalue, SSAVAR*& first) {
 }
 
 } // namespace
+
+bool is_SSA_memory(const SYMTAB* sym, const SSA_BUILD& build) {
+    return !sym->is_automatic() || may_be_reached_by_pointers(sym) || build.indexed.count(sym);
+}
 
 bool find_SSA_place(const NODE* t, SSA_PLACE* place) {
     place->length = INT65(static_cast<int64_t>(t->type->size));
@@ -142,7 +147,7 @@ SSAVAR* SSAVAR_for_reference(const NODE* lvalue, const SSA_BUILD& build) {
     for_each_in_ring(first, [&](SSAVAR* v) {
         if (is_same_entry(v, place, lvalue)) entry = v;
     });
-    if (!entry) return make_entry(place, lvalue, first);
+    if (!entry) return make_entry(place, lvalue, build, first);
     // `restrict` speaks of a scope: the entry has the accesses of several.
     if (entry->tree->ls != lvalue->ls) entry->tree->ls = nullptr;
     return entry;

@@ -243,6 +243,24 @@ void counted(int n) {
     }
 }
 
+// Members of a local structure whose array is subscripted; the second loop reaches the member by a subscript.
+struct local {
+    int first;
+    unsigned crc;
+    int data[6];
+};
+// FUNCTION: local_members
+// HAS: /\$O\$v\d+ = \$O\$v\d+ & 1 .*/
+unsigned local_members(int n, int at) {
+    struct local m = {n, 3, {1, 2, 3, 4, 5, 6}};
+    int k, *words = (int *)&m;
+    for (k = 0; k < n; k++) m.crc = m.crc & 1 ? m.crc >> 1 ^ 0xA001u : m.crc >> 1;
+    m.data[at & 3] += (int)m.crc;
+    for (k = 0; k < n; k++) m.crc += (unsigned)words[at - k], words[at & 1] ^= k;
+    for (k = 0; k < n; k++) m.data[k & 3] += m.first, m.first += k;
+    return m.crc + (unsigned)m.data[1] + (unsigned)m.first;
+}
+
 // On both paths to the sum `copy` is what `n` is, until one is changed.
 // FUNCTION: copied
 // NOT: copy *
@@ -285,6 +303,7 @@ int main(void) {
     put_i16(met_in_the_loop(a, 2, 6) + a[3] + a[2] + h);
     counted(16), counted(0);
     for (i = 0; i < 16; i++) put_i16((int)bins[i]);
+    for (i = 0; i < 6; i++) put_u32(local_members(i, 6 - i % 2) + local_members(7 - i, 7));
     put_i16(copied(4, 1, a) + copied(5, 9, a) * 3 + a[2]);
     within_endless_loop();
     return 0;

@@ -230,13 +230,13 @@ int main(void) {
         put_i16(heaviest(9)); put_i16(heaviest_of_changing(9, &cell)); put_i16(cell);
         put_i32(accumulated(in, c, c)); put_i16(assembled(c));
     }
+    for (c = 0; c < 16; c++) shorts[c] = (short)(c * 3 + 1);
+    put_u32(stepped_once_more(shorts));
     cell = 77;
     tab[1] = &cell;
     put_i16(closed_by_its_test(30)); put_i16(cell);
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));
-    for (c = 0; c < 16; c++) shorts[c] = (short)(c * 3 + 1);
-    put_u16(stepped_once_more(shorts));
     return 0;
 }

@@ -346,7 +346,7 @@ void SOLVER::find_ranges(FUNINFO* caller, size_t first) {
         if (auto at = of_statement.find(statement); at != of_statement.end())
             for (size_t i : at->second) arguments[i].range = vpset_of_tree(arguments[i].passed, env);
     };
-    if (names_a_local) construct_vpsets_for_cfg(1);
+    if (names_a_local) construct_vpsets_for_cfg(1, VP_QUESTION::ARGUMENTS);
     if (!vpenv_store) init_vpenv_allocation({}, 0);
     for (size_t i = first; i < arguments.size(); ++i)
         if (!arguments[i].tree && arguments[i].passed) arguments[i].range = vpset_of_tree(arguments[i].passed, vpenv());

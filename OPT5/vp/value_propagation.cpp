@@ -40,34 +40,6 @@ constexpr size_t MOST_LISTED_CASES = 16;
 constexpr size_t MOST_ORIGINS_BACK = 6; // assignments ahead of a test
 constexpr int MOST_NODES_OF_ORIGIN = 12;
 
-// ---- Which symbols
-
-bool is_tracked_global(const SYMTAB* sym) {
-    // In normal form its name stands under an address.
-    return !trees_are_normalized && sym->level == 0 && (sym->sclass == SC_STATIC || sym->sclass == SC_EXTDEF || sym->sclass == SC_EXTERN) &&
-           sym != errno_symbol && !sym->is_function() && !(sym->cqual & CQ_GLOBAL_REGISTER) && !sym->is_clustered &&
-           !sym->type->is_volatile() && !volit_vars && !may_be_reached_by_pointers(sym);
-}
-
-void find_tracked_symbols() {
-    std::vector<SYMTAB*> locals, globals;
-    std::unordered_map<const SYMTAB*, bool> seen; // looked up alone
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            for_each_subtree(static_cast<const NODE*>(s->first), [&](const NODE* t) {
-                if (t->op != NAME || !t->u.sym || !has_vpset(t->u.sym->type)) return;
-                SYMTAB* sym = t->u.sym;
-                if (!seen.try_emplace(sym, true).second) return;
-                if (sym->is_automatic() && only_its_name_reaches(sym)) locals.push_back(sym);
-                if (is_tracked_global(sym)) globals.push_back(sym);
-            });
-    std::sort(locals.begin(), locals.end(), sym_uid_less);
-    std::sort(globals.begin(), globals.end(), sym_uid_less);
-    const size_t first_global = locals.size();
-    locals.insert(locals.end(), globals.begin(), globals.end());
-    init_vpenv_allocation(std::move(locals), first_global);
-}
-
 bool has_same_values(const TYPE* a, const TYPE* b) {
     return has_value_range(a) && has_value_range(b) && a->size == b->size && wraps_signed(a) == wraps_signed(b) &&
            !a->is_enum() && !b->is_enum() && a->is_bool() == b->is_bool();
@@ -212,7 +184,7 @@ struct ACCUMULATOR {
 
 class VALUE_SETS {
 public:
-    bool find(bool with_loops); // false: no fixpoint
+    bool find(bool with_loops); // false: no fixpoint. What is tracked has been found.
     const vpenv* of(const BBLK* bb, bool at_exit) const {
         if (number_of[bb] < 0 || !at(number_of[bb]).is_reached) return nullptr;
         return at_exit ? &at(number_of[bb]).exit : &at(number_of[bb]).entry;
@@ -554,7 +526,6 @@ bool VALUE_SETS::run_pass(int pass) {
 }
 
 bool VALUE_SETS::find(bool with_loops) {
-    find_tracked_symbols();
     read_graph(with_loops);
     find_altered();
     if (with_loops) find_accumulators();
@@ -570,8 +541,10 @@ std::unique_ptr<VALUE_SETS> sets;
 
 } // namespace
 
-void construct_vpsets_for_cfg(int noLoops) {
-    need(fact::block_numbers | fact::loops | fact::alias_marks);
+void construct_vpsets_for_cfg(int noLoops, VP_QUESTION question) {
+    need(fact::alias_marks);
+    if (!find_tracked_symbols(question)) return;
+    need(fact::block_numbers | fact::loops);
     sets = std::make_unique<VALUE_SETS>();
     if (sets->find(!noLoops)) return;
     if (print_debug) debug_printf("\t*** Failed to find VP fixpoint!\n");

@@ -4,6 +4,7 @@
 //     vpenv.cpp              environments: what the tracked variables hold, sharing what is equal
 //     vp_eval.cpp            sets of trees, what conditions and statements do to an environment
 //     vp_builtins.cpp        the same of built-in functions
+//     vp_symbols.cpp         which variables are tracked
 //     value_propagation.cpp  the fixpoint over the blocks
 //     vp_loops.cpp           what the sets and the loop hierarchy tell each other
 //     vp_formals.cpp         what all calls pass in parameters
@@ -22,10 +23,15 @@ void do_value_propagation();
 void install_value_propagation(); // once: the loop hierarchy, and rooms below that ask for values, find it then
 
 // ---- Environments of blocks, from `construct` to `deconstruct`
-void construct_vpsets_for_cfg(int noLoops);
+// What is going to be asked: whatever rewriting looks at, divisions and choices alone, or arguments of calls alone.
+enum class VP_QUESTION { REWRITING, DIVISIONS, ARGUMENTS };
+void construct_vpsets_for_cfg(int noLoops, VP_QUESTION question = VP_QUESTION::REWRITING); // none where nothing is asked
 void deconstruct_vpsets_for_cfg();
 // At the block's entry, or exit; null where no path leads there, or nothing is known.
 const vpenv* bb_vpenv(const BBLK* bb, bool at_exit);
+
+// ---- vp_symbols.cpp
+bool find_tracked_symbols(VP_QUESTION question); // false: none, and there is no store of environments
 
 // ---- Rewriting
 // By an environment that holds while the tree is evaluated. `lvalue`: the tree is a place that is written or has its

@@ -404,7 +404,7 @@ std::unique_ptr<VALUES_AT> walk_values;
 
 void begin_walk() {
     walked = nullptr;
-    construct_vpsets_for_cfg(1);
+    construct_vpsets_for_cfg(1, VP_QUESTION::DIVISIONS);
 }
 void walk_to(const BBLK* bb, const NODE* statement) {
     if (!vpenv_store) return;

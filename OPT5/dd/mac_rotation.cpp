@@ -257,6 +257,9 @@ void ROTATOR::rotate(BBLK* bb) {
     }
     sum.drop();
     subscripts.drop();
+    LIST* end = before;
+    while (end->rest) end = end->rest;
+    std::swap(end->first->right, bb->branch()->right); // the labels, of edges that may have been split
     erase_statements(bb);
     set_statements(bb, before);
 }

@@ -264,7 +264,7 @@ bool has_back_edge(const FUNINFO* f) {
 
 void SOLVER::enter_functions() {
     for (FUNINFO* f : callers_first()) {
-        if (f->formals.empty()) continue;
+        if (f->formals.empty() || !f->bb_list) continue; // a body that was expanded at its last call is gone
         functions.push_back(f);
         const CURRENT current(f);
         const PARAMETER_READS reads(f);

@@ -1,4 +1,6 @@
 // Arithmetic of 16, 32 and 64 bits at its extremes, both signs: in loops, by constants, through hidden operands, mixed.
+// Steps that ask for what bodies do, behind the expansion of a function that goes with its last call:
+// optimize: --call_assumptions=2 --opt_passes=6,10,5
 #include <zrun.h>
 
 typedef long long i64;

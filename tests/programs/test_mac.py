@@ -188,6 +188,11 @@ class Mac(unittest.TestCase):
             with self.subTest(reason=reason, body=body):
                 self.assertEqual(calls_in(part), [])
 
+    def test_a_loop_that_stays_keeps_its_edges(self):
+        body = "int i; long s = 0; for (i = 0; i < m; i++) s += 3L * i, p[j] += (long)t * q[i]; return s;"
+        Program([f"long f0(int m, int* q, long* p, int j, int t) {{ {body} }}\n"],
+                ["put_i32(f0(n, h, w, 2, 3));"]).optimized(self, ["--opt_level=2"])
+
     def test_forms_of_programs(self):
         program = self.program_of(TAKEN)
         for (body, calls), part in zip(TAKEN.items(), program.optimized(self, ["--opt_level=2"])):

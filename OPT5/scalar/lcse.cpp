@@ -10,10 +10,12 @@
 //
 // Needs: alias marks, pointees, pointer groups, points-to. Leaves: what rests on the graph; symbols are split anew.
 // Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
-// forgotten where the place or its address may change. Trees without effects alone are numbered, in statements that
-// evaluate all of them ahead of their one effect: of `*p + f()` the load may come first or last. The first occurrence
-// is evaluated whenever its statement is, so that nothing is computed that was not. A chain ends where an exception may
-// leave a statement in its middle.
+// forgotten where the place or its address may change. Trees without effects alone are numbered: in statements that
+// evaluate all of them ahead of their one effect, and, in others, those that no effect among the operands may change, so
+// that they have one value wherever they come in the order of evaluation. Of `*p + f()` the load may come first or last,
+// and takes no part if the call may store there. The first occurrence is evaluated whenever its statement is, so that
+// nothing is computed that was not; what may trap is no first occurrence beside a call that may not return. A chain ends
+// where an exception may leave a statement in its middle.
 #include "OPT5/scalar/lcse.h"
 
 #include "OPT5/alias/alias.h"
@@ -35,6 +37,7 @@
 #include <algorithm>
 #include <cmath>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 namespace {
@@ -42,6 +45,7 @@ namespace {
 using VALUE = int; // a value's number; 0: none
 constexpr size_t MOST_LOADS = 32, MOST_HOLDERS = 4;
 constexpr int MOST_NODES = 64; // of a tree that is worth looking for
+constexpr int MOST_MIXED_NODES = 256; // of a statement whose effects stand among its reads: each read is asked about each
 constexpr double COST_OF_ASSIGNMENT = 1;
 
 bool op_is_load(int op) { return op == UMULT || op == STDOT || op == STREF; }
@@ -268,6 +272,63 @@ VALUE NUMBERS::of_step(const NODE* asg, VALUE a, VALUE b) {
     return computed_as({op, code, code == 1 ? 0 : code, a, b});
 }
 
+// ---- Statements whose effects stand among their reads
+
+// Assignments and calls are the effects; of other operators it is not known here what becomes of their operands.
+bool effects_are_known(const NODE* statement) {
+    return !any_subtree(statement, [statement](const NODE* t) {
+        if (t->op == CSE_ORIG || t->op == CSE_DUPE || t->op == ASM) return true;
+        if (t == statement || !op_has_effect(t->op)) return false;
+        return !writes_left_operand(t->op) && t->op != CALL && t->op != UCALL && t->op != ICALL && t->op != COMMAOP;
+    });
+}
+
+bool may_not_pass_control(const NODE* tree) {
+    return any_subtree(tree, [](const NODE* t) {
+        return op_is_call(t->op) || ((op_is_load(t->op) || t->op == NAME) && lvalue_is_volatile(t));
+    });
+}
+
+bool may_trap(const NODE* tree) {
+    return any_subtree(tree, [](const NODE* t) {
+        return t->op == DIV || t->op == MOD || t->op == UMULT || t->op == STREF || op_is_call(t->op);
+    });
+}
+
+// What the statement evaluates ahead of its own effect, if that is the last one.
+std::vector<const NODE*> operands_with_effects(const NODE* t) {
+    const bool is_call = (t->op == ASG || t->op == STASG) && t->right->op == CALL; // made last
+    std::vector<const NODE*> operands{t->left};
+    if (is_call) operands.push_back(t->right->left);
+    operands.push_back(is_call ? t->right->right : t->right);
+    operands.erase(std::remove_if(operands.begin(), operands.end(),
+                                  [](const NODE* n) { return !n || !tree_has_side_effects(n); }),
+                   operands.end());
+    return operands;
+}
+
+// Calls `mark` for each operand below and with `t` that acts or that one of the effects may change. True of `t` itself.
+template <class F>
+bool mark_unCSEable_opds(const NODE* t, const std::vector<const NODE*>& effects, const F& mark) {
+    if (!t) return false;
+    const NODE *left = t->left, *right = t->right;
+    if (t->op == UAND || t->op == ARGREF || t->op == STARG || t->op == STDOT) { // the object is not read as a whole
+        left = without_members(left);
+        if (left->op == UMULT || left->op == STREF) left = left->left;
+        if (left->op == NAME) left = nullptr;
+        right = nullptr;
+    }
+    bool is_out = mark_unCSEable_opds(left, effects, mark);
+    is_out |= mark_unCSEable_opds(right, effects, mark);
+    is_out = is_out || !tree_changes_nothing(t) || std::any_of(effects.begin(), effects.end(), [t](const NODE* effect) {
+        if (op_is_call(t->op)) return tree_modifies_lvalue_in_tree(effect, t);
+        return (op_is_load(t->op) || (t->op == NAME && t->u.sym && !t->u.sym->is_function())) &&
+               tree_modifies_lvalue(effect, t);
+    });
+    if (is_out) mark(t);
+    return is_out;
+}
+
 // ---- The trees of a chain
 
 // What is known of a value: which variables have it, or where it was computed first and is computed again.
@@ -298,6 +359,7 @@ private:
     void block(BBLK* bb);
     void end_chain();
     void statement(LIST* s);
+    void mixed_statement(NODE* t);
     void assignment(LIST* s);
     bool is_redundant(const NODE* t);
     void learn_store(const NODE* t, VALUE v);
@@ -313,6 +375,8 @@ private:
     NUMBERS numbers;
     std::unordered_map<VALUE, OCCURRENCES> values; // looked up, never walked
     STATEMENTS_AHEAD ahead;
+    std::unordered_set<const NODE*> unCSEable; // of the statement in work; membership only
+    bool keeps_traps = false;                  // what may trap does not move ahead of it
     std::vector<BBLK*> blocks; // of the chain
     const BBLK* chain_end = nullptr;
     LIST* current = nullptr;
@@ -351,6 +415,7 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
     });
     numbers.begin_statement();
     if (!reads_come_first(t)) {
+        mixed_statement(t);
         numbers.forget_changed(t);
         return;
     }
@@ -366,6 +431,29 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
         return;
     default: assignment(s);
     }
+}
+
+// The operands that keep their value throughout take part; what is assigned is not learned.
+void COMMON_SUBEXPRESSIONS::mixed_statement(NODE* t) {
+    const bool is_test = t->op == IF || t->op == SWITCH, assigns = writes_left_operand(t->op) && t->right;
+    if (!is_test && !assigns && t->op != RETURN && t->op != CALL) return;
+    if ((is_test && t->left->op == ENDLOOP) || tree_is_arg_prolog(t)) return;
+    if (count_nodes_in_tree(t) > MOST_MIXED_NODES || !effects_are_known(t)) return;
+    const std::vector<const NODE*> effects = operands_with_effects(t);
+    auto mark = [this](const NODE* operand) { unCSEable.insert(operand); };
+    mark_unCSEable_opds(t->left, effects, mark);
+    mark_unCSEable_opds(t->right, effects, mark);
+    keeps_traps = std::any_of(effects.begin(), effects.end(), may_not_pass_control);
+    if (is_test) {
+        read_operands(t->left, true);
+    } else if (t->op == ASG && t->right->op == CALL) {
+        read_operands(t->right, true);
+        read_place(t->left, true);
+    } else {
+        read_operands(t, true);
+    }
+    unCSEable.clear();
+    keeps_traps = false;
 }
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
@@ -452,10 +540,14 @@ void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
 
 void COMMON_SUBEXPRESSIONS::read(NODE*& slot, bool is_certain) {
     if (!slot || (number_of_operands[slot->op] == 0 && !good_CSE_tree(slot, false))) return;
-    if (!reuse(slot, is_certain)) read_operands(slot, is_certain);
+    if (unCSEable.count(slot) || !reuse(slot, is_certain)) read_operands(slot, is_certain);
 }
 
 void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
+    if (writes_left_operand(t->op)) {
+        read_place(t->left, is_certain);
+        return read(t->right, is_certain);
+    }
     switch (t->op) {
     case UAND:
     case ARGREF:
@@ -522,7 +614,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
         return true;
     }
     if (!known.first) {
-        if (!is_certain) return false;
+        if (!is_certain || (keeps_traps && may_trap(t))) return false;
         known.first = &slot;
         known.cell = current;
         known.block = blocks.size();

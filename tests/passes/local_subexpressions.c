@@ -2,6 +2,7 @@
 // RUN: --opt_level=2 --disable_inlining --debug:validate
 // LEVELS: 1 3
 #include <zrun.h>
+void exit(int);
 
 struct S { float re, im; int tag; };
 int g, h;
@@ -87,6 +88,23 @@ int other_calls(int a) {
     return s + reads_g(a);
 }
 
+// Effects among the operands: what they cannot change is shared, the rest is evaluated where it stands.
+// FUNCTION: steps_and_sums
+// COUNT 1: a * b + 3
+int steps_and_sums(const int *p, int a, int b) { int s = *p++ * 5 + (a * b + 3); return s * (a * b + 3) + *p++ - *p; }
+// FUNCTION: calls_and_sums
+// COUNT 1: a * b + 3
+// COUNT 2: *p
+int calls_and_sums(int *p, int a, int b) { return *p * 7 + bump(a * b + 3) + (a * b + 3) * *p; }
+int assigned_between(int *p, int *q, int a, int b) {
+    int s = *p * 3 + b, t = (a * b + 3) * 3 + s;
+    t -= bump(t) * 3 + (*q++ = b - 6, *p * 3 + b) + (a = b - 1, a * b + 3) * 5;
+    if (bump(a * b + 3) < 99 && bump(b) + (*q += 4, *p * 3 + b) > 6) return t + (a * b + 3) * *q;
+    return t * 3 + a;
+}
+void need_divisor(int b) { if (!b) exit(0); }
+int divided_behind_call(int a, int b) { return bump(a) + (need_divisor(b), a / b + 1) + (b + 3) * (a / b + 1); }
+
 // Accesses a constant apart share the sum of base and index.
 struct T { int a; long b; } tab[6];
 // FUNCTION: neighbours
@@ -138,6 +156,9 @@ int main(void) {
         put_u32(wraps(row, c < 0 ? 65535u : c));
         put_i16(pure_calls(c, &g)); put_i16(g); here = &g; put_i16(other_calls(c));
         here = &g - 2; put_i16(self(&pp, &pp));
+        put_i16(steps_and_sums(row, c, 3)); put_i16(calls_and_sums(&g, c, 3)); put_i16(calls_and_sums(&x, c, 2));
+        put_i16(assigned_between(row + 3, row + 3, c, 2)); put_i16(assigned_between(row, row + 4, c, c)); put_i16(row[3]);
     }
+    for (c = 3; c > -2; c--) put_i16(divided_behind_call(7, c));
     return 0;
 }

@@ -9,6 +9,8 @@
 #include "OPT5/ir/loops.h"
 #include "OPT5/scalar/eda.h"
 #include "OPT5/scalar/fcp.h"
+#include "OPT5/scalar/gcse.h"
+#include "OPT5/scalar/gdflow.h"
 #include "OPT5/scalar/implied_tests.h"
 #include "OPT5/dd/inductions.h"
 #include "OPT5/scalar/lcp.h"
@@ -16,6 +18,7 @@
 #include "OPT5/dd/merge.h"
 #include "OPT5/scalar/rename.h"
 #include "OPT5/scalar/simpcfg.h"
+#include "OPT5/target/bif.h"
 
 #include <cstring>
 #include <functional>
@@ -59,8 +62,8 @@ public:
     // ---- Statements
     void assign_old(SYMTAB* sym = nullptr) { assign(sym ? sym : x, OLD); }
     void hold_place() { assign(z, 77); } // of the write, which comes once there is a graph
-    void put_write(NODE* place) {
-        NODE* t = write_of(place);
+    void put_write(NODE* place) { put(write_of(place)); }
+    void put(NODE* t) {
         for_each_cell([&](LIST* s) {
             if (s->first->op != ASG || s->first->right->op != ICON || s->first->right->u.lval != INT65(77)) return;
             erase_tree(s->first);
@@ -193,6 +196,53 @@ TEST(WrittenPlaces, Constants) {
         fast_CP(1, 0);
         return !w.old_value_is_read_behind();
     });
+}
+
+// A built-in function writes an operand, `x`, or another variable: then it is known what a second product of x is.
+TEST(WrittenPlaces, OperandsOfBuiltins) {
+    struct {
+        const char* who;
+        bool knows_constants;
+        void (*run)();
+    } const users[] = {{"what assignments in force give", true, [] { copyprop(1); }},
+                       {"the propagation of constants", true, [] { fast_CP(1, 0); }},
+                       {"the superblock", true, [] { optimize_superblocks_in_cfg(); }},
+                       {"common subexpressions of a block", false, [] { lcse(); }},
+                       {"those of a function", false, [] { annotate_cfg(), gcse(), clean_up_gdflow_bitvecs(); }}};
+    WORLD::set_up_once();
+    init_simplifier();
+    init_BIF_descriptors();
+    for (const auto& user : users)
+        for (bool writes_x : {true, false}) {
+            WORLD w(ASG, NO_WRAPPER);
+            SYMTAB *first = w.local("first"), *second = w.local("second"), *other = w.local("other");
+            auto product = [&w] {
+                NODE* sum = WORLD::added(w.name(w.x), WORLD::added(w.name(w.z), w.name(w.y)));
+                return maketree(MULT, sum, WORLD::number(21), tp->int_t);
+            };
+            if (user.knows_constants) w.assign_old();
+            w.give(first, product());
+            w.hold_place();
+            w.branch_if(w.y, 1, 2);
+            w.define(1);
+            w.give(second, product());
+            w.ret(second);
+            w.define(2);
+            w.ret(first);
+            w.build();
+            NODE* arguments = WORLD::number(0);
+            for (NODE* operand : {w.name(other), w.name(writes_x ? w.x : other)})
+                arguments = maketree(COMMA, maketree(ARGREF, operand, nullptr, tp->mk_ptr(tp->int_t)), arguments,
+                                     tp->int_t);
+            for (long factor : {3, 2}) arguments = maketree(COMMA, WORLD::number(factor), arguments, tp->int_t);
+            w.put(mk_MCALL("__parallel_mpy_add", arguments, tp->int_t));
+            init_aliasing_info(false);
+            user.run();
+            const NODE* value = w.assigned_to(second);
+            const bool reads_x =
+                value && any_subtree(value, [&w](const NODE* t) { return t->op == NAME && t->u.sym == w.x; });
+            EXPECT_EQ(reads_x, writes_x) << user.who;
+        }
 }
 
 TEST(WrittenPlaces, KnownParts) {

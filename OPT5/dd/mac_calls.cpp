@@ -64,7 +64,7 @@ struct PRODUCT {
     NODE* multiply = nullptr; // the MULT itself
 };
 
-// One from memory goes first.
+// One from memory comes first.
 bool are_halves(const NODE* x, const NODE* y) {
     return is_an_s16_UMULT_operand(x) && (is_an_s16_operand(y) || is_an_s16_constant_operand(y));
 }

@@ -4,7 +4,7 @@
 // Needs: the expressions of `annotate_cfg`, natural loops. Leaves: a simplified graph where a loop went; the expressions are
 // stale then.
 // Sound because the promise ahead of a loop, which is of that loop alone, bounds its iterations: a loop without a bound may
-// be there to wait forever, and stays. A loop goes only where it writes nothing but variables that its exit does not find
+// be there to wait forever, and stays. A loop is removed only where it writes nothing but variables that its exit does not find
 // live, so that the first iteration alone, or all of them, make no difference.
 #include "OPT5/scalar/gcse.h"
 
@@ -110,7 +110,7 @@ bool improve_single_loop(const PLAIN_LOOP& loop, long most) {
     return true;
 }
 
-// A loop around one that goes is looked at in the next round.
+// A loop around a removed one is looked at in the next pass.
 bool improve_loops() {
     need(fact::loops);
     std::vector<std::pair<PLAIN_LOOP, long>> loops;

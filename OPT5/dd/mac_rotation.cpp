@@ -148,6 +148,13 @@ bool multiplies_loaded(const NODE* t) {
     });
 }
 
+// Not of what addresses are computed by.
+bool has_product(const NODE* t) {
+    for (; t && t->op != UMULT && t->op != STREF; t = t->left)
+        if (t->op == MULT || has_product(t->right)) return true;
+    return false;
+}
+
 void tell_of_block(BBLK* bb) {
     int products = 0;
     const LIST* first = nullptr;
@@ -163,7 +170,7 @@ void tell_of_block(BBLK* bb) {
         is_told = true;
     }
     for (const LIST* s = bb->statements; s; s = s->rest) {
-        if (!is_sum_into_target(s->first) || !count_multiplies(s->first->right, false)) continue;
+        if (!is_sum_into_target(s->first) || !has_product(s->first->right)) continue;
         remark(PASS, s->psn, REMARK::MISSED, "adds apart from multiplying: " + why_not_rotated(bb, s, products));
         is_told = true;
     }

@@ -45,7 +45,7 @@ const ROW rows[] = {
     {FIXED, "build graph",                 nullptr, always, buildcfg, none, fact::block_numbers},
     {F,     "tail recursion",              nullptr, always, remove_tail_recursion, none, graph},
     {F,     "first simpcfg",               nullptr, always, [] { simpcfg(0, 0); }, none, graph},
-    {F,     "first fast_CP",               nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
+    {F,     "first fast_CP",               nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph | alias_marks},
     {FIXED, "scan definition",             nullptr, always, [] { preprocess_fundef(currfuninfo); }, none, graph},
     {FIXED, "call sites",                  nullptr, always, size_site_sets, none, fact::every},
     {F,     "parameters",                  nullptr, always, init_ipcp_for_fun, none, fact::every},

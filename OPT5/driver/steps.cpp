@@ -213,7 +213,9 @@ void loop_if_interchange() {
 // A hierarchy that is built propagates values by itself.
 void value_propagation() {
     do_value_propagation();
-    if (vp_changed) simpcfg(0, 0);
+    if (!vp_changed) return;
+    changed(fact::graph);
+    simpcfg(0, 0);
 }
 
 void nothing() {}
@@ -230,9 +232,9 @@ using fact::none;
 // clang-format off
 const ROW steps[] = {
     // kind, name, frame, condition, action, needs, leaves
-    /*  0 */ {F, "pass 1 fcp/eda", nullptr, L2, [] { fast_CP(4, 0); elim_dead_assigns(0, 0); }, alias_marks, graph},
-    /*  1 */ {F, "pass 1 fast_CP(4,0)", nullptr, L1, [] { fast_CP(4, 0); }, alias_marks, graph},
-    /*  2 */ {F, "value propagation for pass 1", nullptr, L2, value_propagation, alias_marks, graph},
+    /*  0 */ {F, "pass 1 fcp/eda", nullptr, L2, [] { fast_CP(4, 0); elim_dead_assigns(0, 0); }, alias_marks, graph | alias_marks},
+    /*  1 */ {F, "pass 1 fast_CP(4,0)", nullptr, L1, [] { fast_CP(4, 0); }, alias_marks, graph | alias_marks},
+    /*  2 */ {F, "value propagation for pass 1", nullptr, L2, value_propagation, alias_marks, graph | alias_marks},
     /*  3 */ {B, "analyze globals", nullptr, always, analyze_global_symbols, none, none},
     /*  4 */ {B, "detect_recursion", nullptr, always, detect_recursion, none, none},
     /*  5 */ {B, "do_interprocedural_propagation", nullptr, always, do_interprocedural_propagation, none, none},
@@ -245,7 +247,7 @@ const ROW steps[] = {
     /* 12 */ {F, "stack sharing", nullptr, is_stack_shared, stack_sharing, none, graph},
     /* 13 */ {F, "CPS", nullptr, always, straighten_cond_paths, none, graph},
     /* 14 */ {L, "early LIR", nullptr, always, early_LIR, none, none},
-    /* 15 */ {F, "early fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
+    /* 15 */ {F, "early fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph | alias_marks},
     /* 16 */ {L, "MVP global assertions", nullptr, [] { return do_IP_MVP; }, add_MVP_IP_global_assertions, none, none},
     /* 17 */ {L, "intraprocedural MVP", nullptr, L2, intraprocedural_MVP, none, none},
     /* 18 */ {L, "value propagation for SIMD", nullptr, L2_and_SIMD, value_propagation_for_SIMD, none, none},
@@ -253,9 +255,9 @@ const ROW steps[] = {
     /* 20 */ {F, "non-DD clone SSA NASSERTs", &S, L2_with_assertions, clone_SSA_NASSERTs, none, every},
     /* 21 */ {F, "non-DD SSA CP", &S, L2, [] { propagate_SSA_constants(1); }, none, every},
     /* 22 */ {F, "non-DD SSA EDA", &S, L2, eliminate_dead_SSA_assignments, none, every},
-    /* 23 */ {F, "SSA RP with benign loads", nullptr, L2, [] { promote_to_registers(true); }, none, graph},
+    /* 23 */ {F, "SSA RP with benign loads", nullptr, L2, [] { promote_to_registers(true); }, none, graph | alias_marks},
     /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
-    /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph},
+    /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph | alias_marks},
     /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
     /* 28 */ {F, "forward_substitution", &DF, L2_with_loops, nothing, none, graph | alias_marks},
@@ -286,26 +288,26 @@ const ROW steps[] = {
     /* 53 */ {L, "simplify_useless_loop_clones", nullptr, always, nothing, none, none},
     /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, advise, none, graph | alias_marks},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
-    /* 56 */ {F, "value_propagation", nullptr, L2_without_loops, value_propagation, alias_marks, graph},
+    /* 56 */ {F, "value_propagation", nullptr, L2_without_loops, value_propagation, alias_marks, graph | alias_marks},
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},
     /* 58 */ {F, "SSA_propagate_vector", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
     /* 59 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},
-    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_to_registers(false); }, none, graph},
+    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_to_registers(false); }, none, graph | alias_marks},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
-    /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph},
+    /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph | alias_marks},
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},
-    /* 64 */ {F, "global CP", nullptr, L2_with_branches, [] { unbuild_loop_hierarchy(); copyprop(2); }, none, graph},
+    /* 64 */ {F, "global CP", nullptr, L2_with_branches, [] { unbuild_loop_hierarchy(); copyprop(2); }, none, graph | alias_marks},
     /* 65 */ {F, "late points-to", nullptr, L2_with_branches, late_points_to, none, every},
-    /* 66 */ {F, "global CSE", nullptr, L2_with_branches, global_CSE, none, graph},
+    /* 66 */ {F, "global CSE", nullptr, L2_with_branches, global_CSE, none, graph | alias_marks},
     /* 67 */ {F, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, alias_marks, graph},
-    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph},
-    /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph},
+    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph | alias_marks},
+    /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph | alias_marks},
     /* 70 */ {L, "DD restructuring", nullptr, always, nothing, none, none},
     /* 71 */ {L, "expand cluster refs", nullptr, always, expand_cluster_refs, none, none},
     /* 72 */ {F, "CSU returning temp", nullptr, always, subst_csu_returning_temp_for_local_var, none, graph},
-    /* 73 */ {F, "superblocks", nullptr, L1, optimize_superblocks_in_cfg, alias_marks, graph},
-    /* 74 */ {F, "subrange", nullptr, L1, [] { lcse_subrange_assignments(); elim_dead_subrange_assigns(); }, alias, graph},
-    /* 75 */ {F, "lcp", nullptr, L1, [] { copyprop(1); }, none, graph},
+    /* 73 */ {F, "superblocks", nullptr, L1, optimize_superblocks_in_cfg, alias_marks, graph | alias_marks},
+    /* 74 */ {F, "subrange", nullptr, L1, [] { lcse_subrange_assignments(); elim_dead_subrange_assigns(); }, alias, graph | alias_marks},
+    /* 75 */ {F, "lcp", nullptr, L1, [] { copyprop(1); }, none, graph | alias_marks},
     /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, graph},
     /* 77 */ {F, "lcse", nullptr, L1, lcse, alias, graph},
     /* 78 */ {F, "propagate increments", nullptr, L1, propagate_increments, alias_marks, graph},

@@ -279,7 +279,7 @@ int elim_dead_assigns(bool keep_embedded, bool early) {
         graph_changed = delay_assignments();
         if (graph_changed) promote_all_embedded_assignments();
     }
-    changed(fact::none);
+    changed(elimination.count ? fact::none : fact::alias_marks);
     if (!early && !f->bb_list->loop && (graph_changed || (elimination.count && some_block_only_jumps()))) simpcfg(false, false);
     return elimination.count;
 }

@@ -574,7 +574,9 @@ void GLOBAL_CSE::finish() {
     const bool has_split = on_edges.insert_useful_blocks();
     for (NODE* t : taken_away) erase_tree(t);
     if (!taken_away.empty()) sym_split(currfuninfo);
-    changed(has_split ? fact::none : fact::graph);
+    const bool any = applied || has_split || !taken_away.empty();
+    // A temporary may hold the address of an object that was only accessed.
+    if (any) changed(has_split ? fact::none : fact::graph);
 }
 
 void GLOBAL_CSE::order_triples() {

@@ -295,6 +295,5 @@ void copyprop(int mode) {
 void lcse_subrange_assignments() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
     need(fact::alias);
-    walk_local_asgs(ASGS_TO_PARTS);
-    changed(fact::graph);
+    if (walk_local_asgs(ASGS_TO_PARTS)) changed(fact::graph);
 }

@@ -73,5 +73,5 @@ void propagate_assignments_into_tests() {
     count_loops_around_blocks();
     BBLK* const entry = currfuninfo->bb_list;
     for (BBLK* bb = entry->rdflink; bb; bb = bb == entry ? nullptr : bb->rdflink) prop_asg_into_if(bb);
-    changed(fact::graph);
+    changed(fact::graph | fact::alias_marks | fact::live_variables); // what a block reads and writes is as it was
 }

@@ -268,5 +268,5 @@ void rename_symbols() {
     if (!currfuninfo->bb_list || currfuninfo->bb_list->predecessors || currfuninfo->saves_environment) return;
     need(fact::dominators | fact::live_variables);
     if (currfuninfo->lva_sym_count) RENAMER().run();
-    ::changed(fact::graph);
+    ::changed(fact::graph | fact::alias_marks);
 }

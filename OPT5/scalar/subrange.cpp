@@ -208,6 +208,7 @@ public:
         overwritten.clear();
         if (dropped) drop_empty_cells(&bb->statements);
     }
+    bool removed_any() const { return removed != 0; }
 
 private:
     static constexpr size_t MOST_COVERS = 32;
@@ -235,11 +236,12 @@ private:
 
     // The effects of what would have been stored stay.
     void remove(NODE*& t) {
+        ++removed;
         const bool has_effect = t->right && tree_has_side_effects(t->right);
         if (print_debug)
             debug_printf(is_plain_assignment(t) ? "\n(%ld) DEAD ASSIGNMENT (edsa_ASG):  %s, Effect? %d\n"
                                                 : "\n(%ld) DEAD ASSIGNMENT (edsa_opASG) : %s, Effect? %d\n",
-                         ++count, stmt2infix(t).c_str(), has_effect);
+                         removed, stmt2infix(t).c_str(), has_effect);
         NODE* effect = t->right;
         t->right = nullptr;
         erase_tree(t);
@@ -264,7 +266,7 @@ private:
     const OBJECT_LIVES objects;
     BITVEC live;
     std::vector<SUBRANGE> overwritten; // later in the block, and not read up to there
-    long count = 0;
+    long removed = 0;
 };
 
 } // namespace
@@ -274,5 +276,5 @@ void elim_dead_subrange_assigns() {
     need(fact::alias);
     DEAD_STORES stores;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) stores.run(bb);
-    changed(fact::graph);
+    if (stores.removed_any()) changed(fact::graph);
 }

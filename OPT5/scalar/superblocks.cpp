@@ -61,5 +61,7 @@ void optimize_superblocks_in_cfg() {
         for (BBLK* bb : superblock->contents)
             if (!bb->is_in_LIR_form()) walk_block(known, bb, &changed);
     }
-    if (changed) simpcfg(false, false);
+    if (!changed) return;
+    ::changed(fact::graph);
+    simpcfg(false, false);
 }

@@ -1,7 +1,7 @@
 // Which variables a run of value sets tracks: those on whose values something that is asked depends.
 //
-// Asked are conditions, the operators that the simplifier does more with where it knows bounds, assertions, and in loops
-// addresses. What a variable is asked for, the names in each tree that is assigned to it are asked for too. All else stays
+// Asked are conditions, the operators that the simplifier does more with where it knows bounds, assertions, what is assigned
+// a constant, and in loops addresses. What a variable is asked for, the names in each tree that is assigned to it are asked for too. All else stays
 // without a binding, as a variable that may have any value.
 #include "OPT5/vp/vp.h"
 
@@ -98,6 +98,7 @@ private:
         }
         if (!is_asked && t->left && t->left->op == NAME && writes_left_operand(t->op)) {
             const int written = t->left->u.sym ? number_of(t->left->u.sym) : NOTHING;
+            if (written >= 0 && t->op == ASG && t->right->op == ICON) ask(written); // which it may always be
             if (t->right) tree(t->right, written, false);
             if (written < 0 || target < 0) return;
             parts.push_back({target, written});

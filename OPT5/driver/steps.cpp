@@ -161,8 +161,10 @@ struct LOOP* root() {
 void promote_to_registers(bool with_assertions) {
     if (pass_debug_bare_SSA)
         enter_and_leave_SSA_form(false, false, false);
-    else if (promote_vars_to_registers(with_assertions))
+    else if (promote_vars_to_registers(with_assertions)) {
+        if (with_assertions) changed(fact::graph); // the first promotion may leave fewer objects whose address is taken
         forget_hierarchy();
+    }
 }
 
 template <class F>
@@ -251,12 +253,12 @@ const ROW steps[] = {
     /* 16 */ {L, "MVP global assertions", nullptr, [] { return do_IP_MVP; }, add_MVP_IP_global_assertions, none, none},
     /* 17 */ {L, "intraprocedural MVP", nullptr, L2, intraprocedural_MVP, none, none},
     /* 18 */ {L, "value propagation for SIMD", nullptr, L2_and_SIMD, value_propagation_for_SIMD, none, none},
-    /* 19 */ {F, "explode auto structs", nullptr, L2, explode_auto_struct_vars, none, graph},
+    /* 19 */ {F, "explode auto structs", nullptr, L2, explode_auto_struct_vars, none, every},
     /* 20 */ {F, "non-DD clone SSA NASSERTs", &S, L2_with_assertions, clone_SSA_NASSERTs, none, every},
     /* 21 */ {F, "non-DD SSA CP", &S, L2, [] { propagate_SSA_constants(1); }, none, every},
     /* 22 */ {F, "non-DD SSA EDA", &S, L2, eliminate_dead_SSA_assignments, none, every},
-    /* 23 */ {F, "SSA RP with benign loads", nullptr, L2, [] { promote_to_registers(true); }, none, graph | alias_marks},
-    /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, graph},
+    /* 23 */ {F, "SSA RP with benign loads", nullptr, L2, [] { promote_to_registers(true); }, none, every},
+    /* 24 */ {F, "expand bitfields", nullptr, always, expand_bitfields, none, every},
     /* 25 */ {F, "fast_CP(0,1)", nullptr, L1, [] { fast_CP(0, 1); }, alias_marks, graph | alias_marks},
     /* 26 */ {F, "add profile loop annotations", nullptr, always, add_loop_annotation_from_profile, none, graph | alias_marks},
     /* 27 */ {L, "CD vectorizations", nullptr, always, do_cd_vectorization, none, none},
@@ -265,7 +267,7 @@ const ROW steps[] = {
     /* 30 */ {F, "SSA_NASSERTs", &N_and_S, L2_with_assertions, clone_SSA_NASSERTs, none, every},
     /* 31 */ {F, "SSA_propagate", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
     /* 32 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},
-    /* 33 */ {F, "SSA_reg_promote", &N, L2, promote_in_loops, none, graph | alias_marks},
+    /* 33 */ {F, "SSA_reg_promote", &N, L2, promote_in_loops, none, every},
     /* 34 */ {F, "loop_assertions", &D, L2_with_loops, [] { with_hierarchy([] { find_loop_assertions(nullptr); }); }, none, graph | alias_marks},
     /* 35 */ {F, "sink_unused_definitions", &D, L2_with_loops, [] { with_hierarchy(sink_definitions); }, none, graph | alias_marks},
     /* 36 */ {L, "undeltafy", &D, L2, [] { undeltafy_dd_loops(root()); }, none, none},
@@ -286,13 +288,13 @@ const ROW steps[] = {
     /* 51 */ {L, "explode_arrays", nullptr, L2, explode_local_arrays, none, none},
     /* 52 */ {L, "unroll_for_SP", &D_with_dependence, L2, [] { unroll_loops_for_SP(root()); }, none, none},
     /* 53 */ {L, "simplify_useless_loop_clones", nullptr, always, nothing, none, none},
-    /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, advise, none, graph | alias_marks},
+    /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, advise, none, every},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {F, "value_propagation", nullptr, L2_without_loops, value_propagation, alias_marks, graph | alias_marks},
-    /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, graph | alias_marks},
+    /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, every},
     /* 58 */ {F, "SSA_propagate_vector", &D_and_S, L2_with_loops, [] { propagate_SSA_constants(3); }, none, every},
     /* 59 */ {F, "SSA_deadasg", &N_and_S, L2_with_loops, eliminate_dead_SSA_assignments, none, every},
-    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_to_registers(false); }, none, graph | alias_marks},
+    /* 60 */ {F, "SSA_reg_promote_with_simpcfg", &N_and_no_hierarchy, L2, [] { promote_to_registers(false); }, none, every},
     /* 61 */ {L, "CD ILP", nullptr, always, do_cd_ilp, none, none},
     /* 62 */ {F, "late fast_CP(4,1)", nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph | alias_marks},
     /* 63 */ {L, "Disclose Vectors", nullptr, always, [] { disclose_vector_operations(false); }, none, none},
@@ -300,7 +302,7 @@ const ROW steps[] = {
     /* 65 */ {F, "late points-to", nullptr, L2_with_branches, late_points_to, none, every},
     /* 66 */ {F, "global CSE", nullptr, L2_with_branches, global_CSE, none, graph | alias_marks},
     /* 67 */ {F, "Zelkova rotate loops", nullptr, L2_with_branches_on_28, rotate_loops_for_accumulators, alias_marks, graph},
-    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, graph | alias_marks},
+    /* 68 */ {F, "late rename symbols", nullptr, L2_with_branches, [] { rename_symbols(); drop_needless_masks(); }, dominators | live_variables, every},
     /* 69 */ {F, "merge symbols", nullptr, L2_with_branches, merge_symbols, fact::loops | live_variables, graph | alias_marks},
     /* 70 */ {L, "DD restructuring", nullptr, always, nothing, none, none},
     /* 71 */ {L, "expand cluster refs", nullptr, always, expand_cluster_refs, none, none},
@@ -308,9 +310,9 @@ const ROW steps[] = {
     /* 73 */ {F, "superblocks", nullptr, L1, optimize_superblocks_in_cfg, alias_marks, graph | alias_marks},
     /* 74 */ {F, "subrange", nullptr, L1, [] { lcse_subrange_assignments(); elim_dead_subrange_assigns(); }, alias, graph | alias_marks},
     /* 75 */ {F, "lcp", nullptr, L1, [] { copyprop(1); }, none, graph | alias_marks},
-    /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, graph},
-    /* 77 */ {F, "lcse", nullptr, L1, lcse, alias, graph},
-    /* 78 */ {F, "propagate increments", nullptr, L1, propagate_increments, alias_marks, graph},
+    /* 76 */ {F, "sti-to-cinit", nullptr, L2, convert_sti_to_cinit, none, every},
+    /* 77 */ {F, "lcse", nullptr, L1, lcse, alias, graph | alias_marks},
+    /* 78 */ {F, "propagate increments", nullptr, L1, propagate_increments, alias_marks, graph | alias_marks},
     /* 79 */ {L, "Disguise Vectors", nullptr, always, disguise_vector_operations, none, none},
     /* 80 */ {L, "late LIR", nullptr, always, late_LIR, none, none},
     // 81, "output function", belongs to the function loop.

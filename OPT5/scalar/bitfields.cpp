@@ -510,5 +510,7 @@ void EXPANSION::run() {
 
 void expand_bitfields() {
     if (print_debug) debug_printf("\n\n\t\t\t---------- ENTERING 'expand_bitfields' -----\n");
-    if (currfuninfo->has_bitfield_access && currfuninfo->bb_list) EXPANSION().run();
+    if (!currfuninfo->has_bitfield_access || !currfuninfo->bb_list) return;
+    EXPANSION().run();
+    changed(fact::graph);
 }

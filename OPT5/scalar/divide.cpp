@@ -353,5 +353,6 @@ void transform_DIVs_by_ICONs() {
     if (value_walk.end) value_walk.end();
     if (!any) return;
     sym_split(currfuninfo);
+    changed(fact::graph | fact::alias_marks);
     promote_all_embedded_assignments();
 }

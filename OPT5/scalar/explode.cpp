@@ -85,6 +85,7 @@ public:
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
             for (LIST** link = &bb->statements; *link;) link = rewrite_statement(link);
         sym_split(currfuninfo);
+        changed(fact::graph);
     }
 
 private:

@@ -345,7 +345,8 @@ struct OCCURRENCES {
 
 class COMMON_SUBEXPRESSIONS {
 public:
-    void run() {
+    // Whether anything was taken away or kept.
+    bool run() {
         for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
             const EDGE* before = bb->predecessors;
             if (!chain_end || !before || before->rest || before->first != chain_end) end_chain();
@@ -353,6 +354,7 @@ public:
         }
         end_chain();
         if (has_new_symbols) sym_split(currfuninfo);
+        return has_changed;
     }
 
 private:
@@ -382,7 +384,7 @@ private:
     LIST* current = nullptr;
     int order = 0;
     long dropped = 0;
-    bool has_new_symbols = false;
+    bool has_new_symbols = false, has_changed = false;
 };
 
 void COMMON_SUBEXPRESSIONS::block(BBLK* bb) {
@@ -471,6 +473,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
         }
         erase_tree(t);
         s->first = nullptr;
+        has_changed = true;
         return;
     }
     VALUE v = 0;
@@ -600,6 +603,7 @@ NODE* remainder_by_quotient(NODE* t) {
 bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
     if (has_quotient(slot)) {
         slot = remainder_by_quotient(slot);
+        has_changed = true;
         numbers.begin_statement();
     }
     NODE* t = slot;
@@ -611,6 +615,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
         if (!rewrite_is_allowed(t)) return false;
         slot = coerce_to_type(t->type->stqs(), mk_NAME(holder, t->ls));
         erase_tree(t);
+        has_changed = true;
         return true;
     }
     if (!known.first) {
@@ -658,7 +663,7 @@ void COMMON_SUBEXPRESSIONS::keep(OCCURRENCES& known, VALUE v) {
     known.first = nullptr;
     numbers.assign(variable, v);
     known.holders.push_back(variable);
-    has_new_symbols = true;
+    has_new_symbols = has_changed = true;
 }
 
 } // namespace
@@ -666,6 +671,6 @@ void COMMON_SUBEXPRESSIONS::keep(OCCURRENCES& known, VALUE v) {
 void lcse() {
     if (!currfuninfo || !currfuninfo->bb_list) return;
     need(fact::alias | fact::points_to);
-    COMMON_SUBEXPRESSIONS().run();
-    changed(fact::graph);
+    const bool any = COMMON_SUBEXPRESSIONS().run();
+    changed(any ? fact::graph : fact::graph | fact::alias_marks);
 }

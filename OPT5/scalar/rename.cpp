@@ -58,12 +58,13 @@ constexpr VALUE NONE = -1;
 
 class RENAMER {
 public:
-    void run() {
+    // Whether a variable was split.
+    bool run() {
         choose();
-        if (variables.empty() || !find_frontiers()) return;
+        if (variables.empty() || !find_frontiers()) return false;
         place_joins();
         currfuninfo->dominators->depth_first_doms([this](BBLK* bb) { enter(bb); }, [this](BBLK* bb) { leave(bb); });
-        rebind();
+        return rebind();
     }
 
 private:
@@ -234,7 +235,8 @@ private:
 
     // ---- Names
 
-    void rebind() {
+    bool rebind() {
+        bool any = false;
         std::vector<SYMTAB*> symbol(web.size(), nullptr);
         for (VARIABLE& v : variables)
             if (v.at_entry != NONE) symbol[static_cast<size_t>(web_of(v.at_entry))] = v.sym;
@@ -243,9 +245,12 @@ private:
         for (const auto& [name, value] : mentions) {
             SYMTAB*& sym = symbol[static_cast<size_t>(web_of(value))];
             const auto v = static_cast<size_t>(by_bit[slot(name->u.sym)]);
-            if (!sym) sym = clones[v]++ == 0 ? variables[v].sym : clone_symbol(variables[v].sym, clones[v] - 1);
+            if (sym) continue;
+            any |= clones[v] > 0;
+            sym = clones[v]++ == 0 ? variables[v].sym : clone_symbol(variables[v].sym, clones[v] - 1);
         }
         for (const auto& [name, value] : mentions) name->u.sym = symbol[static_cast<size_t>(web_of(value))];
+        return any;
     }
 
     struct MENTION {
@@ -267,6 +272,5 @@ private:
 void rename_symbols() {
     if (!currfuninfo->bb_list || currfuninfo->bb_list->predecessors || currfuninfo->saves_environment) return;
     need(fact::dominators | fact::live_variables);
-    if (currfuninfo->lva_sym_count) RENAMER().run();
-    ::changed(fact::graph | fact::alias_marks);
+    if (currfuninfo->lva_sym_count && RENAMER().run()) ::changed(fact::graph | fact::alias_marks);
 }

@@ -215,4 +215,5 @@ void convert_sti_to_cinit() {
     const FUNINFO* f = currfuninfo;
     if (!fun_is_cpp_static_initializer(f) || !f->bb_list || f->bb_list->predecessors || is_called_by_program(f)) return;
     CONVERSION().run();
+    changed(fact::graph);
 }

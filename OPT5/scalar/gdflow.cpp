@@ -469,7 +469,22 @@ static void mark_altered_triples(const BBLK* bb, BITVEC* set) {
     }
 }
 
+// What a write of memory ends.
+static void dump_killed(size_t write) {
+    std::vector<uint32_t> killed;
+    for (uint32_t i = 0; i < unique_triples.size(); ++i)
+        if (unique_triples[i].reads_memory && write_may_alter(unique_triples[i], memory_writes[write])) killed.push_back(i);
+    const std::string text = stmt2infix(memory_writes[write].statement);
+    debug_printf(killed.empty() ? "          Nothing to kill for %s [%ld]\n" : "     Kill aliases of %s [%ld]:\n", text.c_str(),
+                 static_cast<long>(write));
+    for (uint32_t i : killed) {
+        const NODE* t = unique_triples[i].tree;
+        debug_printf("          --- %s [%u] %s\n", opname(t->op), i, tree_to_infix(t).c_str());
+    }
+}
+
 static void dump_altered() {
+    for (size_t i = 0; i < memory_writes.size(); ++i) dump_killed(i);
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
         BITVEC altered(static_cast<uint32_t>(unique_triples.size()));
         mark_altered_triples(bb, &altered);

@@ -38,6 +38,7 @@ constexpr int MOST_ROUNDS = 3;
 
 // ---- Globally constant assignments
 
+// An assignment is globally constant where its variable has no other one and what it assigns does not change.
 class GLOBAL_ASGS {
 public:
     GLOBAL_ASGS() {

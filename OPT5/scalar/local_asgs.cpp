@@ -23,6 +23,7 @@
 #include "OPT5/scalar/subrange.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/simp/simp.h"
+#include "UTIL/abort.h"
 
 #include <algorithm>
 
@@ -152,16 +153,23 @@ void LOCAL_ASGS::learn(const NODE* t) {
 
 // ---- Reads of variables
 
+// The value that the variable still has: neither side of the assignment has been changed since.
+const NODE* LOCAL_ASGS::value_in_force(const SYMTAB* sym) {
+    auto at = names.find(sym);
+    if (at == names.end()) return nullptr;
+    const NAMED* orig = &at->second;
+    OPT_ASSERT(orig->depnum != -1);
+    if (orig->depnum != depnums[sym]) return nullptr;
+    const bool is_copy = orig->value->op == NAME;
+    return is_copy && orig->source_depnum != depnums[orig->value->u.sym] ? nullptr : orig->value;
+}
+
 NODE* LOCAL_ASGS::lookup_ASG(NODE* name) {
-    auto at = names.find(name->u.sym);
-    if (at == names.end()) return name;
-    const NAMED& known = at->second;
-    if (known.depnum != depnums[name->u.sym]) return name;
-    if (known.value->op == NAME && known.source_depnum != depnums[known.value->u.sym]) return name;
-    if ((in_test && known.value->op == NAME) || !rewrite_is_allowed(name)) return name;
-    report_local_replacement("\n\t========== (%ld) 'lookup_ASG' is replacing this:\n", name, known.value);
+    const NODE* value = value_in_force(name->u.sym);
+    if (!value || (in_test && value->op == NAME) || !rewrite_is_allowed(name)) return name;
+    report_local_replacement("\n\t========== (%ld) 'lookup_ASG' is replacing this:\n", name, value);
     any = true;
-    return value_in_place_of(name, known.value);
+    return value_in_place_of(name, value);
 }
 
 NODE* LOCAL_ASGS::read_names(NODE* t) {
@@ -189,12 +197,16 @@ NODE* LOCAL_ASGS::read_names(NODE* t) {
 // A step of a variable with a known value by a constant is an assignment of a constant.
 NODE* LOCAL_ASGS::cp_opASG_RL(NODE* t) {
     if (op_of_opASG[t->op] == ILLOP || !is_private_name(t->left) || !is_manifest_constant(t->right)) return t;
-    auto at = names.find(t->left->u.sym);
-    if (at == names.end() || at->second.depnum != depnums[t->left->u.sym]) return t;
-    if (!is_manifest_constant(at->second.value)) return t;
+    const SYMTAB* target = t->left->u.sym;
+    const NODE* value = value_in_force(target);
+    if (!value || !is_manifest_constant(value)) return t;
     t = opASG_to_ASG(t);
     if (t->op != ASG) {
         debug_printf("\n\n!!! COMPILER (OPTIMIZER) ERROR IN 'cp_opASG_RL' !!!\n\n");
+        return t;
+    }
+    if (assigned_variable(t) != target) {
+        debug_printf("\n\n!!! COMPILER (OPTIMIZER) ERROR IN 'cp_opASG_RL' %s!!!\n\n", stmt2infix(t).c_str());
         return t;
     }
     t->right = read_names(t->right);

@@ -42,9 +42,9 @@ public:
 private:
     // The value of a variable since an assignment. It holds while neither variable has been changed since.
     struct NAMED {
-        NODE* value; // a constant, or a NAME
-        int64_t depnum;
-        int64_t source_depnum; // of the NAME
+        NODE* value = nullptr; // a constant, or a NAME
+        int64_t depnum = -1;
+        int64_t source_depnum = -1; // of the NAME
     };
     // Both are copies.
     struct PART {
@@ -61,6 +61,7 @@ private:
     void forget_parts(const NODE* t);
 
     NODE* read_names(NODE* t);
+    const NODE* value_in_force(const SYMTAB* sym);
     NODE* lookup_ASG(NODE* name);
     NODE* cp_opASG_RL(NODE* t);
     void read_parts(NODE* t);

@@ -68,17 +68,39 @@ long most_iterations(const BBLK* entry) {
     return most;
 }
 
+// The variables that the block writes, if it does nothing else.
+bool writes_variables_alone(const BBLK* bb, std::vector<const NODE*>* written) {
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        const NODE* t = s->first;
+        if (t->op == BRANCH) continue;
+        if (t->op == IF && !tree_has_side_effects(t->left)) continue;
+        const bool assigns = t->op == ASG || is_operator_assignment(t);
+        if (!assigns || t->left->op != NAME || tree_has_side_effects(t->right)) return false;
+        written->push_back(t->left);
+    }
+    return true;
+}
+
+// Ahead of any assignment: it is live then, for which the variables of the whole function need not be asked.
+bool block_reads_one_of(const BBLK* bb, const std::vector<const NODE*>& names) {
+    auto is_one = [&names](const NODE* t) {
+        return t->op == NAME &&
+               std::any_of(names.begin(), names.end(), [t](const NODE* n) { return n->u.sym == t->u.sym; });
+    };
+    for (const LIST* s = bb->statements; s; s = s->rest) {
+        const NODE* t = s->first;
+        const bool assigns = t->op == ASG && t->left->op == NAME;
+        if (any_subtree(assigns ? t->right : t, is_one)) return true;
+        if (assigns && is_one(t->left)) return false;
+    }
+    return false;
+}
+
 bool is_essentially_empty(const PLAIN_LOOP& loop) {
     std::vector<const NODE*> written;
     for (const BBLK* bb : loop.blocks)
-        for (const LIST* s = bb->statements; s; s = s->rest) {
-            const NODE* t = s->first;
-            if (t->op == BRANCH) continue;
-            if (t->op == IF && !tree_has_side_effects(t->left)) continue;
-            const bool assigns = t->op == ASG || is_operator_assignment(t);
-            if (!assigns || t->left->op != NAME || tree_has_side_effects(t->right)) return false;
-            written.push_back(t->left);
-        }
+        if (!writes_variables_alone(bb, &written)) return false;
+    if (block_reads_one_of(loop.exit, written)) return false;
     need(fact::alias_marks | fact::live_variables);
     return live_at_entry_is_known(loop.exit) && std::all_of(written.begin(), written.end(), [&loop](const NODE* name) {
         const int bit = is_private_name(name) ? live_index(name->u.sym) : -1;
@@ -124,16 +146,20 @@ bool improve_loops() {
     return any;
 }
 
-bool any_promise() {
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        if (most_iterations(bb) > 0) return true;
+// Whether some loop may go, by its promise and its header.
+bool any_loop_may_go() {
+    std::vector<const NODE*> written;
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+        const long most = most_iterations(bb);
+        if (most == 1 || (most > 0 && bb->dflink && writes_variables_alone(bb->dflink, &written))) return true;
+    }
     return false;
 }
 
 } // namespace
 
 void restructure_loops() {
-    if (unique_triples.empty() || !any_promise()) return;
+    if (unique_triples.empty() || !any_loop_may_go()) return;
     for (int left = MOST_ROUNDS; left > 0 && improve_loops(); --left) {
         elim_dead_assigns(0, 0);
         simpcfg(0, 0);

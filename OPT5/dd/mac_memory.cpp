@@ -31,7 +31,7 @@ bool is_sum_in_memory(const NODE* t) {
 
 // The address is computed from variables that no store reaches.
 bool has_plain_address(const NODE* place) {
-    while (place->op == STDOT) place = place->left;
+    place = without_members(place);
     if (place->op == NAME) return true;
     auto reads_memory = [](const NODE* t) {
         bool reads = false;

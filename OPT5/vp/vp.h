@@ -43,6 +43,7 @@ std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extr
 
 // ---- vp_check.cpp
 bool values_are_asserted(); // as a debug switch wants it
+bool depends_on_bounds(int op); // the simplifier makes more of it where it knows what its operands may be
 void assert_bindings(BBLK* bb, vpenv env);
 // Of the symbol behind the argument prolog, the first statement: that it has the value, or one of the set where that is null.
 void assert_values_on_entry(class FUNINFO* f, SYMTAB* sym, const vpset& set, const NODE* value);

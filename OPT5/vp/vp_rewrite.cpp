@@ -51,6 +51,8 @@ bool is_left_alone(const NODE* t) {
     }
 }
 
+} // namespace
+
 // An operator that the simplifier does more with where it knows bounds. Quotients by constants keep their shape, in
 // which others are equal to them, until they are taken apart for good.
 bool depends_on_bounds(int op) {
@@ -64,6 +66,8 @@ bool depends_on_bounds(int op) {
     default: return op_is_int_compare(op);
     }
 }
+
+namespace {
 
 class REWRITER {
 public:

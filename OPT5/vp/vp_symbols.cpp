@@ -33,19 +33,10 @@ bool may_be_tracked(const SYMTAB* sym) {
 // What narrows the sets of the names in it: of one by what is known of another.
 bool is_condition(int op) { return op == IF || op == SWITCH || op == ASSERT || op == NASSERT || boolean_result[op]; }
 
-bool depends_on_bounds(int op) {
-    switch (op_of_opASG[op] == ILLOP ? op : op_of_opASG[op]) {
-    case ABS:
-    case DIV:
-    case MOD:
-    case SLL:
-    case SRL:
-    case ANDB:
-    case ORB:
-    case XORB:
-    case ICALL: return true;
-    default: return false;
-    }
+// What is rewritten by the values of its operands, the compound assignments too.
+bool is_rewritten(int op) {
+    const int plain = op_of_opASG[op] == ILLOP ? op : op_of_opASG[op];
+    return depends_on_bounds(plain) || plain == DIV || plain == MOD || plain == SLL;
 }
 
 class ASKED_SYMBOLS {
@@ -110,7 +101,7 @@ private:
     bool is_asking(int op) const {
         if (is_condition(op)) return true;
         switch (question) {
-        case VP_QUESTION::REWRITING: return depends_on_bounds(op) || (in_loop && (op == UMULT || op == STREF));
+        case VP_QUESTION::REWRITING: return is_rewritten(op) || (in_loop && (op == UMULT || op == STREF));
         case VP_QUESTION::ARGUMENTS: return op_is_call(op);
         default: return false;
         }

@@ -4,8 +4,8 @@
 //     for (k...) c[i][j] += a[i][k] * b[k][j];          p = &c[i][j]; for (k...) *p += a[i][k] * b[k][j];
 //
 // Needs: a loop hierarchy, trees in normal form, alias marks. Leaves: the graph.
-// Sound because the address is computed, not used, ahead of the loop, and nothing in the loop changes what it is computed
-// from. Only where no other access of the loop may meet the place: elsewhere it stays in memory, and what is known
+// Sound because the address is computed, not used, ahead of the loop, nothing in the loop changes what it is computed from,
+// and it is arithmetic that cannot fail: `if (d) c[i / d] += ...` stays, since no iteration may divide. Only where no other access of the loop may meet the place: elsewhere it stays in memory, and what is known
 // of its subscripts serves other steps better.
 #include "OPT5/dd/dd.h"
 
@@ -86,11 +86,14 @@ private:
         places.push_back({access, {}, is_write});
     }
 
+    bool may_be_made_ahead(const NODE* t) const {
+        return !tree_has_side_effects(t) && !may_trap(t) && tree_is_RC_in_loop(t, loop, false);
+    }
+
     bool is_candidate(const PLACE& place) const {
         const NODE* t = place.access;
         if (!place.writes || has_own_address(t) || !t->type->is_scalar() || lvalue_is_volatile(t)) return false;
-        if (tree_has_side_effects(t->left) || !tree_is_RC_in_loop(t->left, loop, false)) return false;
-        if (t->right && (tree_has_side_effects(t->right) || !tree_is_RC_in_loop(t->right, loop, false))) return false;
+        if (!may_be_made_ahead(t->left) || (t->right && !may_be_made_ahead(t->right))) return false;
         for (const PLACE& other : places)
             if (&other != &place && lvalues_may_be_aliased(t, other.access, loop)) return false;
         return rewrite_is_allowed(t);

@@ -117,6 +117,8 @@ bool is_named(const NODE* access) {
     return name_accessed(access) != nullptr;
 }
 
+} // namespace
+
 bool may_trap(const NODE* t) {
     return any_subtree(t, [](const NODE* n) {
         if (n->op == DIV || n->op == MOD)
@@ -124,6 +126,8 @@ bool may_trap(const NODE* t) {
         return (n->op == UMULT || n->op == STREF) && !is_named(n);
     });
 }
+
+namespace {
 
 // Control may leave it for good, or for an unknown time.
 bool may_not_return(const NODE* statement) {

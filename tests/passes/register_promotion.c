@@ -261,6 +261,13 @@ unsigned local_members(int n, int at) {
     return m.crc + (unsigned)m.data[1] + (unsigned)m.first;
 }
 
+// The address is a quotient that only some iterations may compute.
+void guarded_address(int *restrict to, const int *restrict from, int n, int i, int d) {
+    int k;
+    for (k = 0; k < n; k++)
+        if (d) to[i / d] += from[k];
+}
+
 // On both paths to the sum `copy` is what `n` is, until one is changed.
 // FUNCTION: copied
 // NOT: copy *
@@ -304,6 +311,8 @@ int main(void) {
     counted(16), counted(0);
     for (i = 0; i < 16; i++) put_i16((int)bins[i]);
     for (i = 0; i < 6; i++) put_u32(local_members(i, 6 - i % 2) + local_members(7 - i, 7));
+    guarded_address(zeros, a, 9, 5, 0), guarded_address(zeros, a, 9, 5, 3);
+    put_i16(zeros[1]);
     put_i16(copied(4, 1, a) + copied(5, 9, a) * 3 + a[2]);
     within_endless_loop();
     return 0;

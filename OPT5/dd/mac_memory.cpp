@@ -10,6 +10,7 @@
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/effects.h"
+#include "OPT5/ir/code_motion.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symtab.h"
@@ -67,6 +68,8 @@ bool SUM_IN_MEMORY::keep_in_variable() {
         if (is_spelled_out(s->first)) s->first = ASG_to_opASG(s->first);
         NODE* t = s->first;
         if (!is_sum_in_memory(t) || !has_plain_address(t->left) || !is_alone(s)) continue;
+        for (BBLK* entry : loop.entries)
+            if (!EDGE_STATEMENTS::may_insert(entry, loop.block)) return false; // a promise stays in front of its loop
         SYMTAB* sym = sym_temp('T', -1, t->left->type->stqs(), nullptr);
         NODE* place = t->left;
         t->left = mk_NAME(sym);

@@ -264,9 +264,7 @@ void ROTATOR::rotate(BBLK* bb) {
     }
     sum.drop();
     subscripts.drop();
-    LIST* end = before;
-    while (end->rest) end = end->rest;
-    std::swap(end->first->right, bb->branch()->right); // the labels, of edges that may have been split
+    std::swap(last_cell(before)->first->right, bb->branch()->right); // the labels, of edges that may have been split
     erase_statements(bb);
     set_statements(bb, before);
 }

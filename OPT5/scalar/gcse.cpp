@@ -235,8 +235,9 @@ bool EXPRESSION::renews(const TRIPLE_RENEWAL& r) const {
             if (s.block == bb->dfn && s.position <= before && s.is_certain && function.stands(s)) last = &s;
         if (!function.tree_is_unaltered(other, bb->dfn, last ? last->position : 1, before)) return false;
         if (last) return true;
-        if ( !bb->predecessors || bb->predecessors->rest) return false;
+        if (!bb->predecessors || bb->predecessors->rest) return false;
         bb = bb->predecessors->first;
+        if (tree_is_EH_SWITCH(bb->branch())) return false; // a statement ahead of it may have been left in its middle
     }
     return false;
 }

@@ -426,6 +426,10 @@ bool Triple_Alias_Table::may_be_altered(size_t lvalue, size_t write) {
     return may;
 }
 
+void Triple_Alias_Table::forget_answers() {
+    for (ROW& row : rows) row.asked = row.altered = BITVEC();
+}
+
 void Triple_Alias_Table::clear() {
     numbers.clear();
     std::vector<ROW>().swap(rows);
@@ -506,7 +510,9 @@ void annotate_cfg() {
         if (print_debug >= 3)
             debug_printf("\tBucket[%d] holds triple <%ld>:\t%s\n", unique_triples[i].tree->op, static_cast<long>(i), text.c_str());
     }
-    if (print_debug >= 3) dump_altered();
+    if (print_debug < 3) return;
+    dump_altered();
+    triples_alias_table.forget_answers(); // what a dump asks is asked again, and counts for the limit then
 }
 
 void clean_up_gdflow_bitvecs() {

@@ -205,7 +205,7 @@ private:
     BITVEC none() const { return BITVEC(static_cast<uint32_t>(asgs.size())); }
 
     static bool is_copy(const NODE* t) {
-        if (t->op != ASG || !is_private_name(t->left)) return false;
+        if (t->op != ASG || tree_is_arg_prolog(t) || !is_private_name(t->left)) return false;
         return t->right->op == ICON || (is_private_name(t->right) && t->right->u.sym != t->left->u.sym);
     }
     // Of an assignment that says the same, from wherever.

@@ -12,7 +12,8 @@
 // Sound because a number stands for one value: an assignment gives its variable another, and the number of a load is
 // forgotten where the place or its address may change. Trees without effects alone are numbered: in statements that
 // evaluate all of them ahead of their one effect, and, in others, those that no effect among the operands may change, so
-// that they have one value wherever they come in the order of evaluation. Of `*p + f()` the load may come first or last,
+// that they have one value wherever they come in the order of evaluation; no variable that an operand writes stands for a
+// value there. Of `*p + f()` the load may come first or last,
 // and takes no part if the call may store there. The first occurrence is evaluated whenever its statement is, so that
 // nothing is computed that was not; what may trap is no first occurrence beside a call that may not return. A chain ends
 // where an exception may leave a statement in its middle.
@@ -378,6 +379,7 @@ private:
     std::unordered_map<VALUE, OCCURRENCES> values; // looked up, never walked
     STATEMENTS_AHEAD ahead;
     std::unordered_set<const NODE*> unCSEable; // of the statement in work; membership only
+    std::unordered_set<const SYMTAB*> written; // by operands of it; membership only
     bool keeps_traps = false;                  // what may trap does not move ahead of it
     std::vector<BBLK*> blocks; // of the chain
     const BBLK* chain_end = nullptr;
@@ -442,6 +444,8 @@ void COMMON_SUBEXPRESSIONS::mixed_statement(NODE* t) {
     if ((is_test && t->left->op == ENDLOOP) || tree_is_arg_prolog(t)) return;
     if (count_nodes_in_tree(t) > MOST_MIXED_NODES || !effects_are_known(t)) return;
     const std::vector<const NODE*> effects = operands_with_effects(t);
+    for (const NODE* e : effects)
+        for_each_written_name(e, [this](const NODE* name, const NODE*) { written.insert(name->u.sym); });
     auto mark = [this](const NODE* operand) { unCSEable.insert(operand); };
     mark_unCSEable_opds(t->left, effects, mark);
     mark_unCSEable_opds(t->right, effects, mark);
@@ -455,6 +459,7 @@ void COMMON_SUBEXPRESSIONS::mixed_statement(NODE* t) {
         read_operands(t, true);
     }
     unCSEable.clear();
+    written.clear();
     keeps_traps = false;
 }
 
@@ -578,7 +583,7 @@ void COMMON_SUBEXPRESSIONS::read_place(NODE* t, bool is_certain) {
 
 SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {
     for (auto it = known.holders.rbegin(); it != known.holders.rend(); ++it)
-        if (numbers.of_variable(*it) == v && type_code((*it)->type) == type_code(type)) return *it;
+        if (!written.count(*it) && numbers.of_variable(*it) == v && type_code((*it)->type) == type_code(type)) return *it;
     return nullptr;
 }
 

@@ -15,6 +15,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/loops.h"
+#include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/eda.h"
@@ -63,7 +64,7 @@ long most_iterations(const BBLK* entry) {
     long most = 0;
     for (const LIST* s = entry->statements; s; s = s->rest) {
         const PRAGMA* p = s->first->op == PPRAGMA ? s->first->pragma : nullptr;
-        if (p && p->kind == PRG_MUST_ITERATE && p->args.size() > 1) most = std::strtol(p->args[1].c_str(), nullptr, 0);
+        if (p && p->kind == PRG_MUST_ITERATE && p->args.size() > 1) most = std::strtol(p->args[1].c_str(), nullptr, 10);
     }
     return most;
 }
@@ -122,6 +123,7 @@ void drop_pragmas_of_loop(BBLK* entry) {
 
 bool improve_single_loop(const PLAIN_LOOP& loop, long most) {
     if (most > 1 && !is_essentially_empty(loop)) return false;
+    if (!rewrite_is_allowed(loop.latch->branch())) return false;
     const int header = loop.blocks.front()->dfn;
     if (print_debug && most == 1)
         debug_printf("\n\tThe loop [%d-%d] executes only once.\n\n", header, loop.latch->dfn);

@@ -99,6 +99,7 @@ public:
     size_t number_of(int triple, const NODE* lvalue); // of the lvalue whose tree has this number; borrowed
     bool was_asked(size_t lvalue, size_t write) const { return rows[lvalue].asked.test(static_cast<uint32_t>(write)); }
     bool may_be_altered(size_t lvalue, size_t write);
+    void forget_answers();
     void clear();
 
 private:

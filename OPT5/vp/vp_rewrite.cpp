@@ -297,7 +297,7 @@ bool is_divisor(const SYMTAB* sym) {
 }
 
 bool gives_power_of_2(const NODE* t, vpenv env, struct LOOP* loop) {
-    if (t->op != ASG || t->left->op != NAME || t->right->op == ICON || !is_integer(t->left->type) ||
+    if (t->op != ASG || !is_private_name(t->left) || t->right->op == ICON || !is_integer(t->left->type) ||
         !positive_tree_is_power_of_2(t->right, loop) || vpenv_store->number_of(t->left->u.sym) < 0)
         return false;
     const vpset s = vpset_of_tree(t->right, env);

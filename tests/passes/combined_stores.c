@@ -109,6 +109,15 @@ void calls_stay(void) {
     g = change();
 }
 
+// The copies of parameters stay, on whatever paths they hold.
+// FUNCTION: one_parameter
+// HAS: a = a
+int one_parameter(int a) {
+    if (g > 3) g = g * a, h = 1;
+    else h = 2;
+    return a + 1;
+}
+
 int main(void) {
     read_between(4);
     put_i16(g);

@@ -139,6 +139,14 @@ int old_and_new(int n, int a) {
 
 int row[10] = {5, 9, 2, 8, 11, 1, 7, 3, 4, 6};
 
+// What holds the sum is written within the statement that reads it again.
+int holder_is_written(int a, int b, int c) {
+    int h = a * b + 29, x;
+    g = h;
+    x = (c ? (h = 5) : 0) + (a * b + 29);
+    return x * 100 + h;
+}
+
 int main(void) {
     struct S s;
     float f;
@@ -149,6 +157,7 @@ int main(void) {
         stored(&s, c, &f); put_f32(f);
         put_i16(stored_result(&x, c)); put_i16(stored_and_changed(&x, &x, &l, c)); put_i16(stored_and_changed(&x, &g, &l, c));
         put_i16(twice_read(c)); put_i16(part(c)); h = c; put_u32(narrow((unsigned *)&h, c)); put_i16(h);
+        put_i16(holder_is_written(c + 6, c + 2, c & 1)); put_i16(g);
         g = c; put_i16(around_calls(&g, c)); put_i16(around_writer(&g, c));
         put_i16(operands_change(c, 7)); put_i16(redundant(c, 5)); put_i16(arms(c, 9)); put_i16(kept(c));
         put_i16(only_on_one_path(c, 6)); put_i16(through_restrict(&g, &h)); put_i16(old_and_new(c, 5));

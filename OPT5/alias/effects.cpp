@@ -197,6 +197,12 @@ SYMTAB* assigned_variable(const NODE* t) {
     return opcode_is_ASG(t->op) && t->left->op == NAME ? t->left->u.sym : nullptr;
 }
 
+bool may_leave_in_the_middle(const NODE* tree) {
+    return any_subtree(tree, [](const NODE* t) {
+        return op_is_call(t->op) || t->op == MCALL || t->op == UMCALL || t->op == ASM || (is_lvalue(t) && lvalue_is_volatile(t));
+    });
+}
+
 bool tree_acts(const NODE* tree) {
     return any_subtree(tree, [](const NODE* t) { return op_has_effect(t->op); });
 }

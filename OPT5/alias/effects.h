@@ -82,6 +82,9 @@ inline bool left_names_variable(const NODE* t) {
 SYMTAB* assigned_variable(const NODE* t);
 // Whether evaluating `tree` does anything but compute a value; reading a volatile object is no act here.
 bool tree_acts(const NODE* tree);
+// Whether control may not come to what follows: a call that does not return, or an event that others outside the program
+// wait for.
+bool may_leave_in_the_middle(const NODE* tree);
 
 // Whether evaluating `tree` leaves all that a tree may read as it is: its only acts are calls that write nothing.
 bool tree_changes_nothing(const NODE* tree);

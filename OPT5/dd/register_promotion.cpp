@@ -50,15 +50,6 @@ SYMTAB* PROMOTION_TEMPS::of(PROMOTION_CANDIDATE& c) {
     return c.temp;
 }
 
-static bool is_access(int op) { return op == NAME || op == UMULT || op == STDOT || op == STREF; }
-
-bool may_leave_in_the_middle(const NODE* statement) {
-    return any_subtree(statement, [](const NODE* t) {
-        return op_is_call(t->op) || t->op == MCALL || t->op == UMCALL || t->op == ASM ||
-               (is_access(t->op) && lvalue_is_volatile(t));
-    });
-}
-
 namespace {
 
 using EVENT = PROMOTION_EVENT;

@@ -51,8 +51,5 @@ constexpr size_t MOST_VALUES_IN_LOOP = 12; // that a loop has registers for
 // Blocks of the graph times batches: what is beyond is promoted within blocks alone. Time stays linear.
 constexpr size_t MOST_BLOCKS_OF_BATCHES = 400000;
 
-// A call that does not come back, or an event that others outside the program wait for.
-bool may_leave_in_the_middle(const NODE* statement);
-
 // Stores of the candidates that another store makes needless, and those that move behind loops. Whether any changed.
 bool promote_stores(const std::vector<std::unique_ptr<PROMOTION_CANDIDATE>>& candidates, PROMOTION_TEMPS& temps);

@@ -193,11 +193,7 @@ void ANNOTATOR::enter_writes(const BBLK* bb, const NODE* t, int at) {
     });
     const bool acts = writes_memory || tree_has_side_effects(t);
     if (writes_memory) memory_writes.push_back(here);
-    if (acts && any_subtree(t, [](const NODE* n) {
-            return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM ||
-                   ((n->op == NAME || n->op == UMULT || n->op == STDOT || n->op == STREF) && lvalue_is_volatile(n));
-        }))
-        staying.push_back(here);
+    if (acts && may_leave_in_the_middle(t)) staying.push_back(here);
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {

@@ -132,7 +132,7 @@ struct PT_STORE {
     POINTER_MAPS maps;
     std::vector<POINTER> pointers;                       // by number, in the order in which they are met
     std::unordered_map<const SYMTAB*, unsigned> numbers; // looked up, never walked
-    SIDE_TABLE<PT_STATE> into, out_of;                   // PT_IN and PT_OUT
+    SIDE_TABLE<PT_STATE> PT_IN, PT_OUT;                  // at the start and end of a block
 
 private:
     static uint32_t next_run(); // unique in the process, never 0

@@ -108,7 +108,7 @@ PT_STATE PROPAGATION::joined(const BLOCK& b) const {
     bool is_first = b.bb != currfuninfo->bb_list;
     for (const EDGE* e = b.bb->predecessors; e; e = e->rest) {
         if (!of(e->first).is_reached) continue;
-        const PT_STATE& from = store.out_of[e->first];
+        const PT_STATE& from = store.PT_OUT[e->first];
         s = is_first ? from : store.meet(s, from);
         is_first = false;
     }
@@ -118,13 +118,13 @@ PT_STATE PROPAGATION::joined(const BLOCK& b) const {
 // Whether what leaves the block has changed.
 bool PROPAGATION::visit(BLOCK& b) {
     const PT_STATE in = joined(b);
-    if (b.is_reached && store.equal(in, store.into[b.bb])) return false;
-    store.into[b.bb] = in;
+    if (b.is_reached && store.equal(in, store.PT_IN[b.bb])) return false;
+    store.PT_IN[b.bb] = in;
     PT_STATE out = in;
     for (const NODE* t : b.acting) transfer.statement(t, out);
-    const bool is_new = !b.is_reached || !store.equal(out, store.out_of[b.bb]);
+    const bool is_new = !b.is_reached || !store.equal(out, store.PT_OUT[b.bb]);
     b.is_reached = true;
-    store.out_of[b.bb] = out;
+    store.PT_OUT[b.bb] = out;
     return is_new;
 }
 
@@ -151,13 +151,13 @@ bool PROPAGATION::propagate() {
 }
 
 void walk(const BBLK* bb, const PT_STORE& store, PT_TRANSFER& transfer, const PT_TRANSFER::LOOK& look) {
-    PT_STATE s = store.into[bb];
+    PT_STATE s = store.PT_IN[bb];
     for (const LIST* l = bb->statements; l; l = l->rest) transfer.statement(l->first, s, look);
 }
 
 // The other statements leave the state as it is.
 void PROPAGATION::bind_accesses_of(const BLOCK& b, const PT_TRANSFER::LOOK& bind) {
-    PT_STATE s = store.into[b.bb];
+    PT_STATE s = store.PT_IN[b.bb];
     auto acting = b.acting.begin();
     for (const LIST* l = b.bb->statements; l; l = l->rest)
         if (acting != b.acting.end() && *acting == l->first)
@@ -170,7 +170,7 @@ void PROPAGATION::run() {
     find_pointers();
     if (store.pointers.empty()) return;
     if (!propagate()) {
-        store.into = store.out_of = SIDE_TABLE<PT_STATE>();
+        store.PT_IN = store.PT_OUT = SIDE_TABLE<PT_STATE>();
         return;
     }
     const PT_TRANSFER::LOOK bind = [this](const NODE* t, const PT_STATE& s) { transfer.bind_accesses(t, s); };
@@ -188,9 +188,9 @@ void dump_PT_info(const PT_STORE& store) {
     debug_printf("\n\n\t\t\tPoints-to data for %s()\n", currfunc->name);
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
         debug_printf("\n  IN[%d]\n", bb->dfn);
-        dump_state(store, store.into[bb]);
+        dump_state(store, store.PT_IN[bb]);
         debug_printf("\n  OUT[%d]\n", bb->dfn);
-        dump_state(store, store.out_of[bb]);
+        dump_state(store, store.PT_OUT[bb]);
         for (const LIST* l = bb->statements; l; l = l->rest) debug_printf("%s\n", stmt2infix(l->first).c_str());
     }
 }

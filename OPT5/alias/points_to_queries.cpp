@@ -78,7 +78,7 @@ SYMTAB* single_pointsto_target_if_known(const PTENV* e) {
 NODE* find_var_init_in_PT_info(SYMTAB* pointer, const BBLK* bb) {
     const PT_STORE* store = PT_store();
     if (!store || !pointer->type->is_pointer()) return nullptr;
-    const PTENV* e = store->binding(pointer, store->out_of[bb]);
+    const PTENV* e = store->binding(pointer, store->PT_OUT[bb]);
     const SYMTAB* base = single_pointsto_target_if_known(e);
     if (!base || base->level != 0 || e->targets.front().stride) return nullptr;
     TYPE* type = tp->mk_ptr(base->type);
@@ -89,7 +89,7 @@ NODE* find_var_init_in_PT_info(SYMTAB* pointer, const BBLK* bb) {
 
 const PTENV* PT_info_at_start(const SYMTAB* pointer, const BBLK* bb) {
     const PT_STORE* store = PT_store();
-    return store ? store->binding(pointer, store->into[bb]) : nullptr;
+    return store ? store->binding(pointer, store->PT_IN[bb]) : nullptr;
 }
 
 // ---- Pairs

@@ -210,7 +210,7 @@ public:
 private:
     void prepare_sets();
     void fill_sets(size_t k);
-    void add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted, const std::vector<CANDIDATES>& known);
+    void add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted, const std::vector<CANDIDATES>& known_behind);
     const BBLK* place_ahead(const CANDIDATE& c, const EVENT& use, const NATURAL_LOOP* loop) const;
     void decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known);
     double gain_of(size_t k, const INSERTIONS& inserted, const VALUE_LIFE& life,
@@ -288,7 +288,7 @@ const BBLK* LOAD_PROMOTER::place_ahead(const CANDIDATE& c, const EVENT& use, con
 }
 
 void LOAD_PROMOTER::add_benign_loads(size_t k, const std::vector<CANDIDATES>& wanted,
-                                     const std::vector<CANDIDATES>& known) {
+                                     const std::vector<CANDIDATES>& known_behind) {
     CANDIDATE& c = *batch[k];
     const CANDIDATES bit = CANDIDATES(1) << k;
     std::vector<size_t> places;
@@ -299,8 +299,7 @@ void LOAD_PROMOTER::add_benign_loads(size_t k, const std::vector<CANDIDATES>& wa
             const BBLK* place = place_ahead(c, e, loop);
             if (!place) break;
             const size_t at = static_cast<size_t>(place->dfn), header = static_cast<size_t>(loop->header->dfn);
-            const MOTION_SETS& s = motion->sets[at];
-            const bool is_known = (s.last | (known[at] & s.passes)) & bit;
+            const bool is_known = known_behind[at] & bit;
             if (!is_known && !(wanted[header] & bit) && !(motion->sets[header].cut & bit)) places.push_back(at);
         }
     }
@@ -320,12 +319,13 @@ void LOAD_PROMOTER::run(const std::vector<CANDIDATE*>& candidates, bool is_globa
     prepare_sets();
     if (!is_global) return decide(motion->no_insertions(), std::vector<CANDIDATES>(graph.blocks.size(), 0));
     if (benign && !loops.inner_first().empty()) {
-        const std::vector<CANDIDATES> wanted = motion->anticipated(), known = motion->available(motion->no_insertions());
+        const std::vector<CANDIDATES> wanted = motion->compute_ANTIN();
+        const std::vector<CANDIDATES> known = motion->compute_AVOUT(motion->no_insertions()).AVOUT;
         for (size_t k = 0; k < batch.size(); ++k)
             if (!batch[k]->may_trap()) add_benign_loads(k, wanted, known);
     }
     const INSERTIONS inserted = motion->latest_insertions_off_back_edges(loops);
-    decide(inserted, motion->available(inserted));
+    decide(inserted, motion->compute_AVOUT(inserted).AVIN);
 }
 
 void LOAD_PROMOTER::decide(const INSERTIONS& inserted, const std::vector<CANDIDATES>& known) {

@@ -225,8 +225,8 @@ void STORE_PROMOTER::fill_sets(MOTION& motion) const {
             const CANDIDATES bit = CANDIDATES(1) << k;
             MOTION_SETS& s = motion.sets[b];
             if (is_dead_end[b]) return;
-            if (batch[k]->points[end - 1].cell) s.first |= bit;
-            if (batch[k]->points[begin].cell) s.last |= bit;
+            if (batch[k]->points[end - 1].cell) s.ANTLOC |= bit;
+            if (batch[k]->points[begin].cell) s.AVLOC |= bit;
             for (size_t i = begin; i < end; ++i)
                 if (!batch[k]->points[i].cell) {
                     s.passes &= ~bit;
@@ -237,7 +237,7 @@ void STORE_PROMOTER::fill_sets(MOTION& motion) const {
 
 // Code on edges is worth it where it stands for stores of a loop.
 void STORE_PROMOTER::drop_poor_insertions(const MOTION& motion, INSERTIONS& inserted) const {
-    const std::vector<CANDIDATES> overwritten = motion.available(inserted);
+    const std::vector<CANDIDATES> overwritten = motion.compute_AVOUT(inserted).AVIN;
     for (size_t k = 0; k < batch.size(); ++k) {
         const CANDIDATES bit = CANDIDATES(1) << k;
         double gone = 0, made = 0;
@@ -286,7 +286,7 @@ VALUE_LIFE STORE_PROMOTER::life_of(const MOTION& motion, const INSERTIONS& inser
 }
 
 void STORE_PROMOTER::decide(const MOTION& motion, const INSERTIONS& inserted) {
-    const std::vector<CANDIDATES> overwritten = motion.available(inserted);
+    const std::vector<CANDIDATES> overwritten = motion.compute_AVOUT(inserted).AVIN;
     const VALUE_LIFE life = life_of(motion, inserted);
     const std::vector<CANDIDATES> live = life.live_at_end(forward);
     for (size_t k = 0; k < batch.size(); ++k) {

@@ -93,7 +93,7 @@ INSERTIONS MOTION::no_insertions() const {
     return none;
 }
 
-std::vector<CANDIDATES> MOTION::anticipated() const {
+std::vector<CANDIDATES> MOTION::compute_ANTIN() const {
     std::vector<CANDIDATES> at_start(graph.blocks.size(), ALL);
     for (bool changed = true; changed;) {
         changed = false;
@@ -102,7 +102,7 @@ std::vector<CANDIDATES> MOTION::anticipated() const {
             CANDIDATES at_end = graph.after[*b].empty() ? 0 : ALL;
             for (size_t next : graph.after[*b]) at_end &= at_start[next];
             const MOTION_SETS& s = sets[*b];
-            const CANDIDATES now = (s.first | (at_end & s.demands)) & ~(s.closed | s.cut);
+            const CANDIDATES now = (s.ANTLOC | (at_end & s.demands)) & ~(s.closed | s.cut);
             changed |= now != at_start[*b];
             at_start[*b] = now;
         }
@@ -110,28 +110,26 @@ std::vector<CANDIDATES> MOTION::anticipated() const {
     return at_start;
 }
 
-std::vector<CANDIDATES> MOTION::available(const INSERTIONS& inserted) const {
-    std::vector<CANDIDATES> at_start(graph.blocks.size(), ALL);
+MOTION::AVAILABLE MOTION::compute_AVOUT(const INSERTIONS& inserted) const {
+    std::vector<CANDIDATES> at_start(graph.blocks.size(), ALL), at_end = at_start;
     for (bool changed = true; changed;) {
         changed = false;
         if (print_debug >= 2) debug_printf("\n\tNext iteration of global AVIN/AVOUT loop\n");
         for (size_t b : graph.order) {
             CANDIDATES now = graph.before[b].empty() ? 0 : ALL;
-            for (size_t k = 0; k < graph.before[b].size(); ++k) {
-                const size_t p = graph.before[b][k];
-                now &= leaves(p, at_start[p]) | inserted[b][k];
-            }
-            now &= ~sets[b].cut;
-            changed |= now != at_start[b];
-            at_start[b] = now;
+            for (size_t k = 0; k < graph.before[b].size(); ++k) now &= at_end[graph.before[b][k]] | inserted[b][k];
+            at_start[b] = now & ~sets[b].cut;
+            now = sets[b].AVLOC | (at_start[b] & sets[b].passes);
+            changed |= now != at_end[b];
+            at_end[b] = now;
         }
     }
-    return at_start;
+    return {std::move(at_start), std::move(at_end)};
 }
 
 // An occurrence is wanted as early as it is anticipated, and postponed from there for as long as no path needs it.
 INSERTIONS MOTION::latest_insertions() const {
-    const std::vector<CANDIDATES> wanted = anticipated(), known = available(no_insertions());
+    const std::vector<CANDIDATES> wanted = compute_ANTIN(), known = compute_AVOUT(no_insertions()).AVOUT;
     INSERTIONS edges = no_insertions();
     for (size_t b : graph.order)
         for (size_t k = 0; k < edges[b].size(); ++k) {
@@ -140,12 +138,12 @@ INSERTIONS MOTION::latest_insertions() const {
             for (size_t next : graph.after[p]) wanted_behind &= wanted[next];
             const MOTION_SETS& s = sets[p];
             const CANDIDATES moves_on = wanted_behind & s.demands & ~(s.closed | s.cut);
-            edges[b][k] = wanted[b] & ~leaves(p, known[p]) & ~moves_on;
+            edges[b][k] = wanted[b] & ~known[p] & ~moves_on;
         }
     std::vector<CANDIDATES> postponed(graph.blocks.size(), ALL);
     auto behind = [&](size_t b, size_t k) {
         const size_t p = graph.before[b][k];
-        return edges[b][k] | (postponed[p] & ~sets[p].first);
+        return edges[b][k] | (postponed[p] & ~sets[p].ANTLOC);
     };
     for (bool changed = true; changed;) {
         changed = false;

@@ -40,8 +40,8 @@ std::vector<bool> dead_ends(const MOTION_GRAPH& forward, const NATURAL_LOOPS& lo
 
 // What a block does to the candidates, between its start and its end in the direction of the motion.
 struct MOTION_SETS {
-    CANDIDATES first = 0;   // has an occurrence that could stand at the start
-    CANDIDATES last = 0;    // has one whose value is good at the end
+    CANDIDATES ANTLOC = 0;  // has an occurrence that could stand at the start
+    CANDIDATES AVLOC = 0;   // has one whose value is good at the end
     CANDIDATES passes = 0;  // what is good at the start is good at the end
     CANDIDATES demands = 0; // an occurrence at the end could stand at the start
     CANDIDATES closed = 0;  // none can be inserted on an edge to the start
@@ -85,9 +85,12 @@ public:
     void enter_block(CANDIDATES bit, const EVENTS& events, size_t begin, size_t end, int first_stop);
 
     // An occurrence is certain to follow each start of a block, before anything that bars it.
-    std::vector<CANDIDATES> anticipated() const;
-    // The value is good at the start of the block, on each path to it.
-    std::vector<CANDIDATES> available(const INSERTIONS& inserted) const;
+    std::vector<CANDIDATES> compute_ANTIN() const;
+    // The value is good at the start of the block, on each path to it, and at its end.
+    struct AVAILABLE {
+        std::vector<CANDIDATES> AVIN, AVOUT;
+    };
+    AVAILABLE compute_AVOUT(const INSERTIONS& inserted) const;
     INSERTIONS no_insertions() const;
     INSERTIONS latest_insertions() const;
     // The same without any on the edge from a loop back to its header: it would run in each iteration, in a block of its
@@ -95,8 +98,6 @@ public:
     INSERTIONS latest_insertions_off_back_edges(const NATURAL_LOOPS& loops);
 
 private:
-    CANDIDATES leaves(size_t b, CANDIDATES at_start) const { return sets[b].last | (at_start & sets[b].passes); }
-
     const MOTION_GRAPH& graph;
 };
 
@@ -119,17 +120,17 @@ void MOTION::enter_block(CANDIDATES bit, const EVENTS& events, size_t begin, siz
         const MOTION_EVENT& e = events[i];
         if (e.kind == MOTION_EVENT::USE) {
             if (e.is_conditional) continue;
-            if (!is_changed && e.order <= first_stop) s.first |= bit;
-            s.last |= bit;
+            if (!is_changed && e.order <= first_stop) s.ANTLOC |= bit;
+            s.AVLOC |= bit;
             continue;
         }
         is_changed = true;
         s.demands &= ~bit;
         s.passes &= ~bit;
         if (e.kind == MOTION_EVENT::DEF)
-            s.last |= bit;
+            s.AVLOC |= bit;
         else
-            s.last &= ~bit;
+            s.AVLOC &= ~bit;
     }
 }
 

@@ -61,7 +61,7 @@ struct EVENT : MOTION_EVENT {
 
 // What all expressions of a function share.
 struct FUNCTION {
-    FUNCTION() : graph(false), is_dead_end(dead_ends(graph, *currfuninfo->loops)), facts(graph.blocks.size(), 0) {}
+    FUNCTION();
 
     const MOTION_GRAPH graph;
     const std::vector<bool> is_dead_end; // by block
@@ -82,6 +82,11 @@ struct FUNCTION {
 
 private:
     bool changes_it(const TRIPLE_WRITE& w, const TRIPLE& t);
+    std::pair<const TRIPLE_WRITE*, const TRIPLE_WRITE*> memory_writes_in(int block) const {
+        const auto b = static_cast<size_t>(block);
+        return {writes_of_memory().data() + memory_writes[b], writes_of_memory().data() + memory_writes[b + 1]};
+    }
+    std::vector<size_t> memory_writes; // the first of each block
 };
 
 class EXPRESSION {
@@ -123,11 +128,23 @@ private:
     std::vector<BLOCK> region; // what some path brings it to
 };
 
-// Those of one block. Writes are in the order of blocks and statements.
+// The first one of a block or behind it. Writes are in the order of blocks and statements.
+const TRIPLE_WRITE* first_in_block(const std::vector<TRIPLE_WRITE>& writes, int block) {
+    return std::lower_bound(writes.data(), writes.data() + writes.size(), block,
+                            [](const TRIPLE_WRITE& w, int b) { return w.block < b; });
+}
 std::pair<const TRIPLE_WRITE*, const TRIPLE_WRITE*> in_block(const std::vector<TRIPLE_WRITE>& writes, int block) {
-    const TRIPLE_WRITE *begin = writes.data(), *end = begin + writes.size();
-    begin = std::lower_bound(begin, end, block, [](const TRIPLE_WRITE& w, int b) { return w.block < b; });
-    return {begin, std::upper_bound(begin, end, block, [](int b, const TRIPLE_WRITE& w) { return b < w.block; })};
+    return {first_in_block(writes, block), first_in_block(writes, block + 1)};
+}
+
+FUNCTION::FUNCTION()
+    : graph(false), is_dead_end(dead_ends(graph, *currfuninfo->loops)), facts(graph.blocks.size(), 0) {
+    size_t w = 0;
+    const std::vector<TRIPLE_WRITE>& writes = writes_of_memory();
+    for (size_t b = 0; b <= graph.blocks.size(); ++b) {
+        while (w < writes.size() && static_cast<size_t>(writes[w].block) < b) ++w;
+        memory_writes.push_back(w);
+    }
 }
 
 bool FUNCTION::changes_it(const TRIPLE_WRITE& w, const TRIPLE& t) {
@@ -143,12 +160,12 @@ int FUNCTION::first_change(const TRIPLE& t, int block, bool with_memory) {
     auto enter = [&first](int position) {
         if (!first || position < first) first = position;
     };
-    for (const SYMTAB* sym : t.variables) {
-        const auto [begin, end] = in_block(writes_of_variable(sym), block);
-        if (begin != end) enter(begin->position);
+    for (const std::vector<TRIPLE_WRITE>* writes : t.writes) {
+        const TRIPLE_WRITE* w = first_in_block(*writes, block);
+        if (w != writes->data() + writes->size() && w->block == block) enter(w->position);
     }
     if (!with_memory) return first;
-    const auto [begin, end] = in_block(writes_of_memory(), block);
+    const auto [begin, end] = memory_writes_in(block);
     for (const TRIPLE_WRITE* w = begin; w != end && (!first || w->position < first); ++w)
         if (changes_it(*w, t)) enter(w->position);
     return first;
@@ -156,13 +173,13 @@ int FUNCTION::first_change(const TRIPLE& t, int block, bool with_memory) {
 
 int FUNCTION::last_change(const TRIPLE& t, int block, bool with_memory, int before) {
     int last = 0;
-    for (const SYMTAB* sym : t.variables) {
-        const auto [begin, end] = in_block(writes_of_variable(sym), block);
+    for (const std::vector<TRIPLE_WRITE>* writes : t.writes) {
+        const auto [begin, end] = in_block(*writes, block);
         for (const TRIPLE_WRITE* w = end; w != begin && w[-1].position > last; --w)
             if (w[-1].position < before) last = w[-1].position;
     }
     if (!with_memory) return last;
-    const auto [begin, end] = in_block(writes_of_memory(), block);
+    const auto [begin, end] = memory_writes_in(block);
     for (const TRIPLE_WRITE* w = end; w != begin && w[-1].position > last; --w)
         if (w[-1].position < before && changes_it(w[-1], t)) last = w[-1].position;
     return last;
@@ -326,7 +343,6 @@ private:
     bool pays(const EXPRESSION& e) const;
     void dump_annotations(size_t k) const;
     CANDIDATES needed_at_entry(size_t b) const { return life.reads[b] | (live[b] & ~life.sets[b]); }
-    CANDIDATES available_at_exit(size_t b) const { return motion.sets[b].last | (known[b] & motion.sets[b].passes); }
 
     const FUNCTION& function;
     const MOTION_GRAPH& graph;
@@ -334,7 +350,7 @@ private:
     MOTION motion;
     VALUE_LIFE life;
     INSERTIONS inserted;
-    std::vector<CANDIDATES> known, live; // at entry, and needed at exit, by block
+    std::vector<CANDIDATES> AVIN, AVOUT, live; // the last: needed at exit
     CANDIDATES redundant = 0;
     std::vector<EDGE_PLACE> inserted_on;
 };
@@ -347,9 +363,11 @@ BATCH::BATCH(const FUNCTION& function, std::vector<std::unique_ptr<EXPRESSION>>&
 
 void BATCH::compute_PPIN() {
     inserted = motion.latest_insertions_off_back_edges(*currfuninfo->loops);
-    known = motion.available(inserted);
+    MOTION::AVAILABLE known = motion.compute_AVOUT(inserted);
+    AVIN = std::move(known.AVIN);
+    AVOUT = std::move(known.AVOUT);
     for (size_t k = 0; k < expressions.size(); ++k)
-        if (decide_reads(expressions[k]->events, CANDIDATES(1) << k, known, life)) redundant |= CANDIDATES(1) << k;
+        if (decide_reads(expressions[k]->events, CANDIDATES(1) << k, AVIN, life)) redundant |= CANDIDATES(1) << k;
     life.edge_sets = inserted;
     live = life.live_at_end(graph);
     for (size_t k = 0; k < expressions.size(); ++k) decide_saves(expressions[k]->events, CANDIDATES(1) << k, live);
@@ -409,7 +427,7 @@ bool BATCH::is_given_where_deleted(size_t k) const {
     for (const EVENT& at : e.events) {
         if (!at.is_deleted || at.is_local) continue;
         for (size_t i = 0; i < graph.before[at.block].size(); ++i) {
-            if ((available_at_exit(graph.before[at.block][i]) | inserted[at.block][i]) >> k & 1) continue;
+            if ((AVOUT[graph.before[at.block][i]] | inserted[at.block][i]) >> k & 1) continue;
             debug_printf("\n\n!!! GCSE(): <%d> is DELETE-AVOUT||INSERT in BB %d %s\n", e.number, at.site->block,
                          tree_to_infix(e.t.tree).c_str());
             is_given = false;
@@ -430,14 +448,14 @@ void BATCH::dump_annotations(size_t k) const {
         for (size_t next : graph.after[b])
             for (size_t i = 0; i < inserted[next].size(); ++i)
                 if (graph.before[next][i] == b) inserted_behind |= inserted[next][i];
-        const CANDIDATES all = s.first | s.last | s.passes | known[b] | live[b] | inserted_behind;
+        const CANDIDATES all = s.ANTLOC | s.AVLOC | s.passes | AVIN[b] | live[b] | inserted_behind;
         if (!(all >> k & 1)) continue;
         debug_printf("\n\nMore global dataflow data for BB->DFN %d\n", graph.blocks[b]->dfn);
         line("   ALTERED:\t%s\n", ~s.passes);
-        line("   PPIN:\t%s\n", known[b] & needed_at_entry(b));
+        line("   PPIN:\t%s\n", AVIN[b] & needed_at_entry(b));
         line("   PPOUT:\t%s\n", live[b]);
         line("   INSERT:\t%s\n", inserted_behind);
-        line("   DELETE:\t%s\n", known[b] & s.first);
+        line("   DELETE:\t%s\n", AVIN[b] & s.ANTLOC);
     }
 }
 
@@ -454,7 +472,6 @@ private:
     void place(std::vector<std::unique_ptr<EXPRESSION>>& expressions);
     void keep_what_stands(TRIPLE& t);
     bool must_wait(const EXPRESSION& e, const std::unordered_set<const NODE*>& held_back) const;
-    bool is_worth_a_look(const TRIPLE& t) const;
     bool is_induction(const TRIPLE& t) const;
     void apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>& insertions);
     void finish();
@@ -471,17 +488,9 @@ private:
 
 // Sites within what another expression took away are none any more.
 void GLOBAL_CSE::keep_what_stands(TRIPLE& t) {
-    t.sites.erase(std::remove_if(t.sites.begin(), t.sites.end(),
-                                 [this](const TRIPLE_SITE& s) { return !function.stands(s); }),
-                  t.sites.end());
+    t.sites.past = std::remove_if(t.sites.begin(), t.sites.end(),
+                                  [this](const TRIPLE_SITE& s) { return !function.stands(s); });
     if (!t.sites.empty()) t.tree = *t.sites.front().slot;
-}
-
-// What is computed in one block only, and not again and again, is common to that block at most.
-bool GLOBAL_CSE::is_worth_a_look(const TRIPLE& t) const {
-    if (t.sites.empty()) return false;
-    return t.sites.front().block != t.sites.back().block ||
-           (currfuninfo->loops->around(t.sites.front().bb) || currfuninfo->loops->has_other_cycles());
 }
 
 // What a loop steps: `x op= e`, or x = ... x ...
@@ -586,10 +595,8 @@ void GLOBAL_CSE::order_triples() {
     std::stable_sort(order.begin(), order.end(),
                      [](size_t a, size_t b) { return unique_triples[a].cost > unique_triples[b].cost; });
     waiting.assign(order.begin(), order.end());
-    for (const TRIPLE& t : unique_triples) {
-        function.questions_left += 64 * static_cast<int64_t>(t.sites.size());
-        function.blocks_left += 256 * static_cast<int64_t>(t.sites.size());
-    }
+    function.questions_left += 64 * static_cast<int64_t>(triple_site_count);
+    function.blocks_left += 256 * static_cast<int64_t>(triple_site_count);
 }
 
 std::vector<std::unique_ptr<EXPRESSION>> GLOBAL_CSE::next_batch() {
@@ -597,7 +604,7 @@ std::vector<std::unique_ptr<EXPRESSION>> GLOBAL_CSE::next_batch() {
     for (; !waiting.empty() && batch.size() < MOST_CANDIDATES; waiting.pop_front()) {
         TRIPLE& t = unique_triples[waiting.front()];
         keep_what_stands(t);
-        if (!is_worth_a_look(t) || is_induction(t)) continue;
+        if (!t.sites.is_worth_a_look() || is_induction(t)) continue;
         auto e = std::make_unique<EXPRESSION>(t, static_cast<int>(waiting.front()), function);
         if (e->may_be_redundant()) batch.push_back(std::move(e));
     }

@@ -3,7 +3,8 @@
 //
 // Trees with one number are the same computation on the same variables and places; whether these hold the same values
 // is what the sites and the writes tell, each with its block and the position of its statement there. Nothing is kept
-// for each expression and block: an expression meets few of either.
+// for each expression and block: an expression meets few of either. What is computed in one block only, and in no cycle,
+// has its sites counted and no more.
 #include "OPT5/scalar/gdflow.h"
 
 #include "FPSIM/fpsim.h"
@@ -12,6 +13,7 @@
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/loops.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/scalar/lcse.h"
@@ -41,11 +43,15 @@ size_t TREE_KEY_HASH::operator()(const TREE_KEY& k) const {
     return h;
 }
 
-TREE_KEY key_of_FCON(const NODE* t) {
+TREE_KEY key_of_constant(const NODE* t) {
+    const unsigned code = type_code(t->type);
+    if (t->op == ICON) return {ICON, code, t->u.lval.value, t->u.lval.sign, 0};
     const uint16_t* m = t->u.fval->mant;
     const uint64_t high = uint64_t{m[0]} << 48 | uint64_t{m[1]} << 32 | uint64_t{m[2]} << 16 | m[3];
-    return {FCON, type_code(t->type), high, m[4] << 16 | m[5], t->u.fval->exp * 2 + t->u.fval->sign};
+    return {FCON, code, high, m[4] << 16 | m[5], t->u.fval->exp * 2 + t->u.fval->sign};
 }
+
+TREE_KEY preconflate_NAME(const NODE* t) { return {NAME, type_code(t->type), identity(t->u.sym), 0, 0}; }
 
 bool is_computing_call(const NODE* t) {
     bool reads_memory = false;
@@ -103,7 +109,13 @@ void insert_statements_ahead(BBLK* bb, STATEMENTS_AHEAD& ahead) {
 }
 
 std::vector<TRIPLE> unique_triples;
+size_t unique_triple_count, triple_site_count;
 Triple_Alias_Table triples_alias_table;
+
+bool TRIPLE_SITES::is_worth_a_look() const {
+    if (empty()) return false;
+    return front().block != back().block || currfuninfo->loops->around(front().bb) || currfuninfo->loops->has_other_cycles();
+}
 
 namespace {
 
@@ -113,6 +125,7 @@ constexpr double LEAST_COST_TO_RENEW = 2;
 
 std::unordered_map<const SYMTAB*, std::vector<TRIPLE_WRITE>> variable_writes; // looked up, never walked
 std::vector<TRIPLE_WRITE> memory_writes, staying;
+std::vector<TRIPLE_SITE> all_sites; // by triple
 
 // The number of a tree says what it is; the triple, where it is computed.
 class ANNOTATOR {
@@ -122,13 +135,11 @@ public:
             int position = 0;
             for (LIST* s = bb->statements; s; s = s->rest) statement(bb, s, ++position);
         }
-        // Blocks come in text order, their sites in order of the numbers.
-        for (TRIPLE& t : unique_triples)
-            std::stable_sort(t.sites.begin(), t.sites.end(),
-                             [](const TRIPLE_SITE& a, const TRIPLE_SITE& b) { return a.block < b.block; });
+        known.clear();
+        sort_sites();
+        share_PT_info_of_loads();
+        make_triples();
         find_renewals();
-        // The tree of a triple is asked about for all its sites.
-        for (const auto& [number, accesses] : loads) share_PT_info(accesses);
     }
 
 private:
@@ -148,23 +159,39 @@ private:
     KNOWN number_of_leaf(const NODE* t);
     KNOWN number_of_call(const NODE* t);
     int number_of_key(const TREE_KEY& key) {
-        if (replaced) {
-            auto at = numbers.find(key);
-            return at == numbers.end() ? NO_TRIPLE : at->second;
-        }
-        return numbers.try_emplace(key, static_cast<int>(numbers.size()) + 1).first->second;
+        if (!replaced) return numbers.of(key);
+        const int* at = numbers.find(key);
+        return at ? *at : NO_TRIPLE;
     }
+    void sort_sites();
+    void make_triples();
+    size_t triple_of(int number);
+    TRIPLE new_triple(int number);
+    void find_lvalues_of(TRIPLE& t);
     void find_renewals();
-    void find_renewals_of(TRIPLE& t);
-    static TREE_KEY shape_of(const TRIPLE& t, double more_cost) {
-        return {t.tree->op, type_code(t.tree->type), static_cast<uint64_t>((t.cost + more_cost) * 2), 0, 0};
+    void find_renewals_of(size_t triple);
+    static TREE_KEY shape_of(const NODE* tree, double cost) {
+        return {tree->op, type_code(tree->type), static_cast<uint64_t>(cost * 2), 0, 0};
     }
-    TRIPLE& triple_of(int number, const NODE* t, double cost);
+    void share_PT_info_of_loads();
 
-    std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> numbers; // looked up, never walked
-    std::unordered_map<int, size_t> triples;                  // by number
-    std::unordered_map<const NODE*, KNOWN> known;             // of the trees of one statement
-    std::unordered_map<int, std::vector<NODE*>> loads;        // by number; the order of the walk decides nothing
+    TREE_NUMBERS numbers;
+    FLAT_MAP<const NODE*, KNOWN> known; // of the trees of one statement
+    struct SITE {
+        int number;
+        float cost;
+        TRIPLE_SITE place;
+    };
+    std::vector<SITE> sites; // in the order of the walk
+    struct ENTRY {
+        size_t begin = 0, end = 0; // of its sites among all
+        size_t triple = NONE;
+        float cost = 0;
+    };
+    static constexpr size_t NONE = SIZE_MAX;
+    std::vector<ENTRY> entries;             // by number
+    std::vector<int> in_order;              // the numbers with sites, in order of the first of them
+    std::vector<std::pair<int, NODE*>> loads; // by number
     struct ASSIGNMENT {
         TRIPLE_RENEWAL place;
         int value; // the number of what is assigned
@@ -174,7 +201,7 @@ private:
     // A variable that counts as its value has the number, and trees without a number get none, while this is set.
     const SYMTAB* replaced = nullptr;
     int replaced_by = NO_TRIPLE;
-    std::unordered_map<TREE_KEY, int, TREE_KEY_HASH> shapes; // how many triples have one operator, type and cost
+    FLAT_MAP<TREE_KEY, int, TREE_KEY_HASH> shapes; // how many triples have one operator, type and cost
     BBLK* block = nullptr;
     LIST* cell = nullptr;
     int position = 0;
@@ -198,15 +225,12 @@ void ANNOTATOR::enter_writes(const BBLK* bb, const NODE* t, int at) {
 
 ANNOTATOR::KNOWN ANNOTATOR::number_of_leaf(const NODE* t) {
     KNOWN k;
-    const unsigned code = type_code(t->type);
     if (replaced && t->op == NAME && t->u.sym == replaced)
         k.number = replaced_by;
     else if (t->op == NAME && t->u.sym && !t->u.sym->is_function())
-        k.number = number_of_key({NAME, code, identity(t->u.sym), 0, 0});
-    else if (t->op == ICON && code)
-        k.number = number_of_key({ICON, code, t->u.lval.value, t->u.lval.sign, 0});
-    else if (t->op == FCON && code)
-        k.number = number_of_key(key_of_FCON(t));
+        k.number = number_of_key(preconflate_NAME(t));
+    else if ((t->op == ICON || t->op == FCON) && type_code(t->type))
+        k.number = number_of_key(key_of_constant(t));
     return k;
 }
 
@@ -231,14 +255,10 @@ ANNOTATOR::KNOWN ANNOTATOR::number_of_call(const NODE* t) {
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::number(const NODE* t) {
-    auto at = known.find(t);
-    if (replaced) {
-        const bool keeps_its_number = at != known.end() && !any_subtree(t, [this](const NODE* n) {
-            return n->op == NAME && n->u.sym == replaced;
-        });
-        return keeps_its_number ? at->second : find(t);
-    }
-    return at != known.end() ? at->second : known[t] = find(t);
+    if (replaced) return find(t);
+    if (const KNOWN* k = known.find(t)) return *k;
+    const KNOWN k = find(t);
+    return known[t] = k;
 }
 
 ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
@@ -262,54 +282,132 @@ ANNOTATOR::KNOWN ANNOTATOR::find(const NODE* t) {
     int x = a.number, y = b.number;
     if (t->right && !is_member && commute_inv[t->op] == t->op && y < x) std::swap(x, y);
     k.number = number_of_key({t->op, code, payload, x, y});
-    if (!replaced && (t->op == UMULT || t->op == STREF)) loads[k.number].push_back(const_cast<NODE*>(t));
+    if (!replaced && (t->op == UMULT || t->op == STREF)) loads.emplace_back(k.number, const_cast<NODE*>(t));
     return k;
 }
 
 // x = ... is the whole statement, and the only effect of it.
 bool assigns_variable(const NODE* t) {
     return t->op == ASG && is_private_name(t->left) && tree_changes_nothing(t->right) &&
-           type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->u.sym->type) == type_code(t->left->type);
+           types_are_close_enough(t->left->type, t->right->type) &&
+           types_are_close_enough(t->left->u.sym->type, t->left->type);
 }
 
-void ANNOTATOR::find_renewals_of(TRIPLE& t) {
-    for (const SYMTAB* x : t.variables) {
+// Sites by number. Blocks come in text order, the sites of a triple in order of their numbers.
+void ANNOTATOR::sort_sites() {
+    entries.resize(static_cast<size_t>(numbers.most()) + 1);
+    auto entry_of = [this](const SITE& s) -> ENTRY& { return entries[static_cast<size_t>(s.number)]; };
+    for (const SITE& s : sites)
+        if (entry_of(s).end++ == 0) {
+            entry_of(s).cost = s.cost;
+            in_order.push_back(s.number);
+        }
+    size_t begin = 0;
+    for (ENTRY& e : entries) {
+        e.begin = begin;
+        begin += e.end;
+        e.end = e.begin;
+    }
+    all_sites.resize(sites.size());
+    for (const SITE& s : sites) all_sites[entry_of(s).end++] = s.place;
+    auto is_ahead = [](const TRIPLE_SITE& a, const TRIPLE_SITE& b) { return a.block < b.block; };
+    for (const ENTRY& e : entries) {
+        TRIPLE_SITE *first = all_sites.data() + e.begin, *past = all_sites.data() + e.end;
+        if (!std::is_sorted(first, past, is_ahead)) std::stable_sort(first, past, is_ahead);
+    }
+    unique_triple_count = in_order.size();
+    triple_site_count = sites.size();
+    std::vector<SITE>().swap(sites);
+}
+
+void ANNOTATOR::make_triples() {
+    if (unique_triple_count < 1) return;
+    need(fact::loops);
+    for (int number : in_order) {
+        const ENTRY& e = entries[static_cast<size_t>(number)];
+        if (TRIPLE_SITES{all_sites.data() + e.begin, all_sites.data() + e.end}.is_worth_a_look()) triple_of(number);
+    }
+}
+
+// The place of the triple with the number, which is made if it has sites.
+size_t ANNOTATOR::triple_of(int number) {
+    if (static_cast<size_t>(number) >= entries.size()) return NONE;
+    ENTRY& e = entries[static_cast<size_t>(number)];
+    if (e.triple != NONE || e.begin == e.end) return e.triple;
+    e.triple = unique_triples.size();
+    unique_triples.push_back(new_triple(number));
+    return e.triple;
+}
+
+void ANNOTATOR::find_renewals_of(size_t triple) {
+    std::vector<TRIPLE_RENEWAL> found;
+    const NODE* tree = unique_triples[triple].tree;
+    const double cost = unique_triples[triple].cost;
+    for (const SYMTAB* x : unique_triples[triple].variables) {
         auto at = assignments.find(x);
         if (at == assignments.end()) continue;
         for (size_t i = 0; i < std::min(at->second.size(), MOST_RENEWALS); ++i) {
             const double more_cost = at->second[i].cost; // of what the variable stands for, once
-            auto like = shapes.find(shape_of(t, more_cost));
-            if (like == shapes.end() || like->second <= (more_cost == 0 ? 1 : 0)) continue;
+            const int* like = shapes.find(shape_of(tree, cost + more_cost));
+            if (!like || *like <= (more_cost == 0 ? 1 : 0)) continue;
             replaced = x;
             replaced_by = at->second[i].value;
-            const KNOWN other = find(t.tree);
+            const KNOWN other = find(tree);
             replaced = nullptr;
-            auto as = other.number == NO_TRIPLE ? triples.end() : triples.find(other.number);
-            if (as == triples.end() || &unique_triples[as->second] == &t) continue;
-            t.renewals.push_back(at->second[i].place);
-            t.renewals.back().other = as->second;
+            if (other.number == NO_TRIPLE) continue;
+            // A new one comes behind those that are walked here.
+            const size_t as = triple_of(other.number);
+            if (as == NONE || as == triple) continue;
+            found.push_back(at->second[i].place);
+            found.back().other = as;
         }
     }
-    std::stable_sort(t.renewals.begin(), t.renewals.end(), [](const TRIPLE_RENEWAL& a, const TRIPLE_RENEWAL& b) {
+    std::stable_sort(found.begin(), found.end(), [](const TRIPLE_RENEWAL& a, const TRIPLE_RENEWAL& b) {
         return a.block != b.block ? a.block < b.block : a.position < b.position;
     });
+    unique_triples[triple].renewals = std::move(found);
 }
 
 void ANNOTATOR::find_renewals() {
     if (assignments.empty()) return;
-    for (const TRIPLE& t : unique_triples)
-        if (t.cost >= LEAST_COST_TO_RENEW) ++shapes[shape_of(t, 0)];
-    for (TRIPLE& t : unique_triples)
-        if (t.cost >= LEAST_COST_TO_RENEW) find_renewals_of(t);
+    for (int number : in_order) {
+        const ENTRY& e = entries[static_cast<size_t>(number)];
+        if (e.cost >= LEAST_COST_TO_RENEW) ++shapes[shape_of(*all_sites[e.begin].slot, e.cost)];
+    }
+    for (size_t i = 0, n = unique_triples.size(); i < n; ++i)
+        if (unique_triples[i].cost >= LEAST_COST_TO_RENEW) find_renewals_of(i);
 }
 
-TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
-    auto [at, is_new] = triples.try_emplace(number, unique_triples.size());
-    if (!is_new) return unique_triples[at->second];
+// The tree of a triple is asked about for all its sites.
+void ANNOTATOR::share_PT_info_of_loads() {
+    std::stable_sort(loads.begin(), loads.end(), [](const auto& a, const auto& b) { return a.first < b.first; });
+    std::vector<NODE*> accesses;
+    for (size_t i = 0; i < loads.size(); ++i) {
+        accesses.push_back(loads[i].second);
+        if (i + 1 < loads.size() && loads[i + 1].first == loads[i].first) continue;
+        share_PT_info(accesses);
+        accesses.clear();
+    }
+}
+
+void ANNOTATOR::find_lvalues_of(TRIPLE& t) {
+    known.clear();
+    for (const NODE* n : lvalues_read_in(t.tree)) {
+        const int of_lvalue = number(n).number;
+        if (of_lvalue == NO_TRIPLE)
+            t.is_asked_whole = true;
+        else if (!is_private_name(n))
+            t.lvalues.push_back(triples_alias_table.number_of(of_lvalue, n));
+    }
+}
+
+TRIPLE ANNOTATOR::new_triple(int number) {
+    const ENTRY& e = entries[static_cast<size_t>(number)];
     TRIPLE t;
-    t.tree = const_cast<NODE*>(tree);
-    t.cost = cost;
-    for_each_subtree(tree, [&t](const NODE* n) {
+    t.sites = {all_sites.data() + e.begin, all_sites.data() + e.end};
+    t.tree = *t.sites.front().slot;
+    t.cost = e.cost;
+    for_each_subtree(static_cast<const NODE*>(t.tree), [&t](const NODE* n) {
         if (n->op == DIV || n->op == MOD || n->op == CALL || n->op == ICALL) t.may_trap = true;
         if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
         if (n->op == CALL && !pure_callee(n)) t.reads_memory = t.is_asked_whole = true;
@@ -319,16 +417,9 @@ TRIPLE& ANNOTATOR::triple_of(int number, const NODE* tree, double cost) {
         else if (std::find(t.variables.begin(), t.variables.end(), n->u.sym) == t.variables.end())
             t.variables.push_back(n->u.sym);
     });
-    if (t.reads_memory)
-        for (const NODE* n : lvalues_read_in(tree)) {
-            const int of_lvalue = this->number(n).number;
-            if (of_lvalue == NO_TRIPLE)
-                t.is_asked_whole = true;
-            else if (!is_private_name(n))
-                t.lvalues.push_back(triples_alias_table.number_of(of_lvalue, n));
-        }
-    unique_triples.push_back(std::move(t));
-    return unique_triples.back();
+    for (const SYMTAB* x : t.variables) t.writes.push_back(&writes_of_variable(x));
+    if (t.reads_memory) find_lvalues_of(t);
+    return t;
 }
 
 void ANNOTATOR::read(NODE*& slot, bool is_certain) {
@@ -337,7 +428,7 @@ void ANNOTATOR::read(NODE*& slot, bool is_certain) {
     if (good_CSE_tree(t, false) && type_code(t->type)) {
         const KNOWN k = number(t);
         if (k.number != NO_TRIPLE && k.cost > 0)
-            triple_of(k.number, t, k.cost).sites.push_back({block->dfn, position, &slot, block, cell, is_certain});
+            sites.push_back({k.number, static_cast<float>(k.cost), {block->dfn, position, &slot, block, cell, is_certain}});
     }
     read_operands(t, is_certain);
 }
@@ -395,11 +486,14 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
 
 // ---- Aliases
 
-size_t Triple_Alias_Table::number_of(int triple, const NODE* lvalue) {
+size_t Triple_Alias_Table::number_of(int tree_number, const NODE* lvalue) {
     if (rows.empty() && print_debug >= 3) debug_printf(" Building triples_alias_table\n");
-    const auto [at, is_new] = numbers.try_emplace(triple, rows.size());
-    if (is_new) rows.push_back({lvalue, BITVEC(), BITVEC()});
-    return at->second;
+    size_t& row = numbers[tree_number];
+    if (!row) {
+        rows.push_back({lvalue, BITVEC(), BITVEC()});
+        row = rows.size();
+    }
+    return row - 1;
 }
 
 bool Triple_Alias_Table::may_be_altered(size_t lvalue, size_t write) {
@@ -454,10 +548,8 @@ static void mark_altered_triples(const BBLK* bb, BITVEC* set) {
     for (size_t i = 0; i < unique_triples.size(); ++i) {
         const TRIPLE& t = unique_triples[i];
         bool is_altered = false;
-        for (const SYMTAB* sym : t.variables) {
-            const std::vector<TRIPLE_WRITE>& writes = writes_of_variable(sym);
-            is_altered |= std::any_of(writes.begin(), writes.end(), is_of_block);
-        }
+        for (const std::vector<TRIPLE_WRITE>* writes : t.writes)
+            is_altered |= std::any_of(writes->begin(), writes->end(), is_of_block);
         for (const TRIPLE_WRITE& w : memory_writes)
             if (!is_altered && is_of_block(w)) is_altered = write_may_alter(t, w);
         if (is_altered) {
@@ -513,6 +605,8 @@ void annotate_cfg() {
 
 void clean_up_gdflow_bitvecs() {
     std::vector<TRIPLE>().swap(unique_triples);
+    std::vector<TRIPLE_SITE>().swap(all_sites);
+    unique_triple_count = triple_site_count = 0;
     triples_alias_table.clear();
     variable_writes.clear();
     std::vector<TRIPLE_WRITE>().swap(memory_writes);

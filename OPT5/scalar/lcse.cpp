@@ -82,11 +82,11 @@ public:
 
     void restart() {
         forget_loads();
-        computed.clear();
+        numbers.restart();
         variables.clear();
     }
 
-    VALUE fresh() { return ++last; }
+    VALUE fresh() { return numbers.fresh(); }
     VALUE of_variable(const SYMTAB* sym) {
         VALUE& v = variables[sym];
         return v ? v : v = fresh();
@@ -102,8 +102,8 @@ public:
 
     // Of the quotient that belongs to a remainder.
     VALUE of_quotient(const NODE* remainder) {
-        return computed_as({DIV, type_code(remainder->type), type_code(remainder->left->type), of(remainder->left),
-                            of(remainder->right)});
+        const VALUE a = of(remainder->left), b = of(remainder->right);
+        return numbers.of({DIV, type_code(remainder->type), type_code(remainder->left->type), a, b});
     }
 
     void stored(const NODE* lvalue, VALUE v) {
@@ -140,10 +140,6 @@ private:
     TREE_KEY key_of_load(const NODE* t);
     VALUE of_reading(const TREE_KEY& key, const NODE* t);
 
-    VALUE computed_as(const TREE_KEY& key) {
-        VALUE& v = computed[key];
-        return v ? v : v = fresh();
-    }
     void enter_load(const TREE_KEY& key, const NODE* lvalue, VALUE v) {
         if (count_nodes_in_tree(lvalue) > MOST_NODES) return;
         if (loads.size() == MOST_LOADS) {
@@ -158,34 +154,33 @@ private:
         loads.clear();
     }
 
-    VALUE last = 0;
-    std::unordered_map<TREE_KEY, VALUE, TREE_KEY_HASH> computed; // looked up, never walked
-    std::unordered_map<const SYMTAB*, VALUE> variables;
+    TREE_NUMBERS numbers;
+    FLAT_MAP<const SYMTAB*, VALUE> variables;
     std::vector<LOAD> loads;
-    std::unordered_map<const NODE*, KNOWN> known; // of the trees of one statement
+    FLAT_MAP<const NODE*, KNOWN> known; // of the trees of one statement
 };
 
 VALUE NUMBERS::of(const NODE* t) {
-    KNOWN& k = known[t];
-    return k.value ? k.value : k.value = find(t);
+    const KNOWN* k = known.find(t);
+    if (k && k->value) return k->value;
+    const VALUE v = find(t);
+    return known[t].value = v;
 }
 
 int NUMBERS::cost_of(const NODE* t) {
-    int& cost = known[t].cost;
-    if (cost < 0) {
-        int sum = t->op == NAME && good_CSE_tree(t, false) ? 1 : weight_of_operator(t);
-        if (t->left) sum += cost_of(t->left);
-        if (t->right) sum += cost_of(t->right);
-        cost = std::min(sum, 1 << 20);
-    }
-    return cost;
+    const KNOWN* k = known.find(t);
+    if (k && k->cost >= 0) return k->cost;
+    int sum = t->op == NAME && good_CSE_tree(t, false) ? 1 : weight_of_operator(t);
+    if (t->left) sum += cost_of(t->left);
+    if (t->right) sum += cost_of(t->right);
+    return known[t].cost = std::min(sum, 1 << 20);
 }
 
 VALUE NUMBERS::find(const NODE* t) {
     switch (t->op) {
     case NAME: return of_name(t);
-    case ICON: return type_code(t->type) ? computed_as({ICON, type_code(t->type), t->u.lval.value, 0, 0}) : fresh();
-    case FCON: return type_code(t->type) ? computed_as(key_of_FCON(t)) : fresh();
+    case ICON:
+    case FCON: return type_code(t->type) ? numbers.of(key_of_constant(t)) : fresh();
     case UAND: return of_address(t->left);
     case UMULT:
     case STDOT:
@@ -199,8 +194,7 @@ VALUE NUMBERS::find(const NODE* t) {
 
 VALUE NUMBERS::of_name(const NODE* t) {
     const SYMTAB* sym = t->u.sym;
-    const unsigned code = type_code(t->type);
-    if (!sym || !code || code != type_code(sym->type)) return fresh();
+    if (!sym || !types_are_close_enough(t->type, sym->type)) return fresh();
     return is_private_name(t) ? of_variable(sym) : of_load(t);
 }
 
@@ -211,7 +205,7 @@ VALUE NUMBERS::of_operator(const NODE* t) {
     if (t->op == PCONV && code == from) return a; // between pointers
     if (commute_inv[t->op] == t->op && b < a) std::swap(a, b);
     // What a compare compares, and a cast converts from, its own type does not tell.
-    return computed_as({t->op, code, t->type->is_pointer() ? 0 : from, a, b});
+    return numbers.of({t->op, code, t->type->is_pointer() ? 0 : from, a, b});
 }
 
 VALUE NUMBERS::of_call(const NODE* t) {
@@ -221,16 +215,16 @@ VALUE NUMBERS::of_call(const NODE* t) {
     NODE* list = get_arguments_to_call(t);
     VALUE arguments = 0;
     for (int i = 0, n = arg_list_count(list); i < n; ++i)
-        arguments = computed_as({COMMA, 0, 0, arguments, of(arg_list_lookup(list, i))});
+        arguments = numbers.of({COMMA, 0, 0, arguments, of(arg_list_lookup(list, i))});
     const TREE_KEY key{t->op, type_code(t->type), identity(callee), arguments, 0};
-    return reads_memory ? of_reading(key, t) : computed_as(key);
+    return reads_memory ? of_reading(key, t) : numbers.of(key);
 }
 
 VALUE NUMBERS::of_address(const NODE* place) {
     int64_t offset = 0;
     place = without_members(place, &offset);
     if (place->op == NAME && place->u.sym && offset == static_cast<VALUE>(offset))
-        return computed_as({UAND, 1, identity(place->u.sym), static_cast<VALUE>(offset), 0});
+        return numbers.of({UAND, 1, identity(place->u.sym), static_cast<VALUE>(offset), 0});
     return fresh();
 }
 
@@ -270,7 +264,7 @@ VALUE NUMBERS::of_step(const NODE* asg, VALUE a, VALUE b) {
     const bool is_plain = op_is_computed(op) && code && (code == by || (code == 1 && asg->right->type->is_int()));
     if (!is_plain) return fresh();
     if (commute_inv[op] == op && b < a) std::swap(a, b);
-    return computed_as({op, code, code == 1 ? 0 : code, a, b});
+    return numbers.of({op, code, code == 1 ? 0 : code, a, b});
 }
 
 // ---- Statements whose effects stand among their reads
@@ -465,8 +459,7 @@ void COMMON_SUBEXPRESSIONS::mixed_statement(NODE* t) {
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
     return t->op == ASG && is_private_name(t->left) && (t->right->op != CALL || is_computing_call(t->right)) &&
-           type_code(t->left->type) == type_code(t->right->type) && type_code(t->left->type) &&
-           numbers.of(t->right) == numbers.of(t->left);
+           types_are_close_enough(t->left->type, t->right->type) && numbers.of(t->right) == numbers.of(t->left);
 }
 
 void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
@@ -497,7 +490,7 @@ void COMMON_SUBEXPRESSIONS::assignment(LIST* s) {
     read_place(t->left, true);
     if (place) std::swap(t->left, place);
     numbers.forget_changed(t);
-    if (v && type_code(t->left->type) == type_code(is_plain ? t->right->type : t->left->type)) learn_store(t, v);
+    if (v && (!is_plain || types_are_close_enough(t->left->type, t->right->type))) learn_store(t, v);
     if (!place) return;
     std::swap(t->left, place);
     erase_tree(place);
@@ -523,7 +516,7 @@ bool is_computed_value(const NODE* t) {
 void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
     const NODE* to = t->left;
     if (is_private_name(to)) {
-        if (type_code(to->type) != type_code(to->u.sym->type)) return;
+        if (!types_are_close_enough(to->type, to->u.sym->type)) return;
         numbers.assign(to->u.sym, v);
         if (to->u.sym->type->qual_kind(false) & QUAL_RESTRICT) return; // what it points to would count as reached by it
         std::vector<SYMTAB*>& holders = values[v].holders;
@@ -583,7 +576,7 @@ void COMMON_SUBEXPRESSIONS::read_place(NODE* t, bool is_certain) {
 
 SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {
     for (auto it = known.holders.rbegin(); it != known.holders.rend(); ++it)
-        if (!written.count(*it) && numbers.of_variable(*it) == v && type_code((*it)->type) == type_code(type)) return *it;
+        if (!written.count(*it) && numbers.of_variable(*it) == v && types_are_close_enough((*it)->type, type)) return *it;
     return nullptr;
 }
 

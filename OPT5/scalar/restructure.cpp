@@ -161,7 +161,7 @@ bool any_loop_may_go() {
 } // namespace
 
 void restructure_loops() {
-    if (unique_triples.empty() || !any_loop_may_go()) return;
+    if (unique_triple_count < 1 || !any_loop_may_go()) return;
     for (int left = MOST_ROUNDS; left > 0 && improve_loops(); --left) {
         elim_dead_assigns(0, 0);
         simpcfg(0, 0);

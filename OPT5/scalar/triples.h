@@ -2,6 +2,7 @@
 #pragma once
 
 #include "BITVEC/bitvec.h"
+#include "OPT5/ir/flat_map.h"
 #include "OPT5/ir/list.h"
 #include "OPT5/ir/node.h"
 
@@ -18,6 +19,7 @@ class SYMTAB;
 // Types that one representation serves: all pointers, integers by width and sign, floating-point numbers by width. 0:
 // no such type.
 unsigned type_code(const TYPE* t);
+inline bool types_are_close_enough(const TYPE* a, const TYPE* b) { return type_code(a) && type_code(a) == type_code(b); }
 
 // An operator, its types, and its operands by number.
 struct TREE_KEY {
@@ -34,7 +36,28 @@ struct TREE_KEY_HASH {
 };
 inline uint64_t identity(const void* p) { return reinterpret_cast<uintptr_t>(p); }
 
-TREE_KEY key_of_FCON(const NODE* t);  // its bits
+// Of a constant: its bits. Without a code where its type has none.
+TREE_KEY key_of_constant(const NODE* t);
+// Of an object in the type that it is read in; without a code where that is no scalar.
+TREE_KEY preconflate_NAME(const NODE* t);
+
+// A number for each key, and for what is like nothing else.
+class TREE_NUMBERS {
+public:
+    int fresh() { return ++last; }
+    int of(const TREE_KEY& key) {
+        int& number = keys[key];
+        return number ? number : number = fresh();
+    }
+    const int* find(const TREE_KEY& key) const { return keys.find(key); }
+    int most() const { return last; }
+    void restart() { keys.clear(); } // numbers that were given are not given again
+
+private:
+    FLAT_MAP<TREE_KEY, int, TREE_KEY_HASH> keys;
+    int last = 0;
+};
+
 bool is_computing_call(const NODE* t); // of a function that only computes, be it from memory
 bool op_is_computed(int op); // an operator on values whose result they decide
 // What an operator costs beside its operands, a load included; casts, leaves and addresses are free.
@@ -72,18 +95,6 @@ struct TRIPLE_RENEWAL {
     size_t other; // number of that triple
 };
 
-struct TRIPLE {
-    NODE* tree = nullptr; // its first occurrence, borrowed
-    double cost = 0;
-    bool may_trap = false; // a division, a load through a pointer, or a call
-    bool reads_memory = false;
-    bool is_asked_whole = false; // a call in it reads memory: the table does not tell what alters that
-    std::vector<const SYMTAB*> variables; // private ones that it reads
-    std::vector<size_t> lvalues;          // other ones, by their numbers in the table of aliases
-    std::vector<TRIPLE_SITE> sites;       // in the order of blocks and statements
-    std::vector<TRIPLE_RENEWAL> renewals; // likewise
-};
-
 // A place where something is written.
 struct TRIPLE_WRITE {
     int block;
@@ -91,12 +102,42 @@ struct TRIPLE_WRITE {
     const NODE* statement;
 };
 
+// Those of one triple, in the order of blocks and statements: a part of the list of all.
+struct TRIPLE_SITES {
+    TRIPLE_SITE *first = nullptr, *past = nullptr;
+    TRIPLE_SITE* begin() const { return first; }
+    TRIPLE_SITE* end() const { return past; }
+    size_t size() const { return static_cast<size_t>(past - first); }
+    bool empty() const { return first == past; }
+    TRIPLE_SITE& front() const { return *first; }
+    TRIPLE_SITE& back() const { return past[-1]; }
+    TRIPLE_SITE& operator[](size_t i) const { return first[i]; }
+    // What is computed in one block only, and not again and again, is common to that block at most.
+    bool is_worth_a_look() const;
+};
+
+struct TRIPLE {
+    NODE* tree = nullptr; // its first occurrence, borrowed
+    double cost = 0;
+    bool may_trap = false; // a division, a load through a pointer, or a call
+    bool reads_memory = false;
+    bool is_asked_whole = false; // a call in it reads memory: the table does not tell what alters that
+    std::vector<const SYMTAB*> variables; // private ones that it reads
+    std::vector<const std::vector<TRIPLE_WRITE>*> writes; // of these
+    std::vector<size_t> lvalues;          // other ones, by their numbers in the table of aliases
+    TRIPLE_SITES sites;
+    std::vector<TRIPLE_RENEWAL> renewals; // in the order of blocks and statements
+};
+
+// Those that are worth a look, and what renewals refer to. Expressions and their sites are counted whether they are in or
+// not.
 extern std::vector<TRIPLE> unique_triples;
+extern size_t unique_triple_count, triple_site_count;
 
 // For each lvalue that triples read, which of the writes to memory may alter it: asked once, when it is wanted first.
 class Triple_Alias_Table {
 public:
-    size_t number_of(int triple, const NODE* lvalue); // of the lvalue whose tree has this number; borrowed
+    size_t number_of(int tree_number, const NODE* lvalue); // of the lvalue whose tree has this number; borrowed
     bool was_asked(size_t lvalue, size_t write) const { return rows[lvalue].asked.test(static_cast<uint32_t>(write)); }
     bool may_be_altered(size_t lvalue, size_t write);
     void forget_answers();
@@ -107,7 +148,7 @@ private:
         const NODE* lvalue;
         BITVEC asked, altered; // by the number of the write
     };
-    std::unordered_map<int, size_t> numbers; // looked up, never walked
+    FLAT_MAP<int, size_t> numbers; // of rows, from 1
     std::vector<ROW> rows;
 };
 extern Triple_Alias_Table triples_alias_table;

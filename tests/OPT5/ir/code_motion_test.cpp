@@ -34,12 +34,12 @@ void fill(MOTION_SETS& s, const std::vector<std::string>& acts, uint32_t closed)
     for (size_t k = 0; k < acts.size(); ++k)
         for (char act : acts[k]) {
             const CANDIDATES bit = CANDIDATES(1) << k;
-            if (act == 'l' && s.demands & bit) s.first |= bit;
+            if (act == 'l' && s.demands & bit) s.ANTLOC |= bit;
             if (act != 'l') s.demands &= ~bit, s.passes &= ~bit;
             if (act == 'k')
-                s.last &= ~bit;
+                s.AVLOC &= ~bit;
             else
-                s.last |= bit;
+                s.AVLOC |= bit;
         }
 }
 
@@ -102,7 +102,7 @@ TEST(CodeMotion, NoPathGetsMoreLoads) {
         MOTION motion(graph);
         for (size_t b = 1; b <= BLOCKS; ++b) fill(motion.sets[b], p.acts[b], random() % 4 ? 0 : random());
         const INSERTIONS inserted = motion.latest_insertions();
-        const std::vector<CANDIDATES> known = motion.available(inserted);
+        const std::vector<CANDIDATES> known = motion.compute_AVOUT(inserted).AVIN;
         for (size_t b : graph.order)
             for (CANDIDATES on_edge : inserted[b]) EXPECT_EQ(on_edge & motion.sets[b].closed, 0u);
         PATH path(p, graph, inserted, known);
@@ -122,10 +122,10 @@ TEST(CodeMotion, LoadsMoveAheadOfLoops) {
     const MOTION_GRAPH graph({{}, {2}, {3}, {2, 4}, {}});
     MOTION motion(graph);
     for (size_t b : graph.order) motion.sets[b].passes = motion.sets[b].demands = 1;
-    motion.sets[3].first = motion.sets[3].last = 1;
+    motion.sets[3].ANTLOC = motion.sets[3].AVLOC = 1;
     const INSERTIONS inserted = motion.latest_insertions();
     EXPECT_EQ(inserted[2][0], 1u);
-    EXPECT_EQ(motion.available(inserted)[3], 1u);
+    EXPECT_EQ(motion.compute_AVOUT(inserted).AVIN[3], 1u);
 }
 
 } // namespace

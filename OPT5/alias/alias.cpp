@@ -26,12 +26,10 @@ const NODE* without_wrappers(const NODE* t) {
     return t;
 }
 
-bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
-
 // The pointer that an lvalue is accessed through, null for a NAME.
 const NODE* pointer_of(const NODE* t) {
     for (t = without_wrappers(t); t->op == STDOT;) t = without_wrappers(t->left);
-    return t->op == UMULT || t->op == STREF ? t->left : nullptr;
+    return op_is_indirection(t->op) ? t->left : nullptr;
 }
 
 PTR* record_of(const NODE* lvalue) {
@@ -159,7 +157,7 @@ static const SYMTAB* object_named_in(const NODE* t) {
     }
 }
 
-COMPARED_LVALUE::COMPARED_LVALUE(const NODE* t) : lvalue(without_wrappers(t)), is_place(::is_lvalue(lvalue)) {
+COMPARED_LVALUE::COMPARED_LVALUE(const NODE* t) : lvalue(without_wrappers(t)), is_place(op_is_lvalue(lvalue->op)) {
     if (!is_place) return;
     volatile_place = lvalue_is_volatile(lvalue);
     named = object_named_in(lvalue);

@@ -14,8 +14,6 @@
 
 namespace {
 
-bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
-
 // A pointer handed out may be used for any address in the object that it points into, and, where that is not known, in
 // any object that pointers reach.
 bool pointer_may_reach(const NODE* pointer, const NODE* lvalue) {
@@ -131,7 +129,7 @@ bool node_may_modify(const NODE* t, const COMPARED_LVALUE& lvalue) {
     if (is_operation_on_memory(t->op)) return call_may_modify(t, lvalue.tree());
     if (t->op == ASM) return asm_may_access(t, lvalue.tree());
     // A volatile access is an event, that keeps its order to other events.
-    if (is_lvalue(t)) return lvalue.is_volatile() && lvalue_is_volatile(t);
+    if (op_is_lvalue(t->op)) return lvalue.is_volatile() && lvalue_is_volatile(t);
     return op_has_effect(t->op) && !op_transfers_control(t->op) && !is_inert(t->op);
 }
 
@@ -142,13 +140,13 @@ bool any_lvalue_read(const NODE* t, const P& predicate) {
         if (t->op == UAND || t->op == ARGREF) { // the address alone
             const NODE* object = without_members(static_cast<const NODE*>(t->left));
             if (object->op == NAME) return t->op == ARGREF && predicate(object);
-            if (object->op == UMULT || object->op == STREF) {
+            if (op_is_indirection(object->op)) {
                 if (object->op == UMULT && any_lvalue_read(object->right, predicate)) return true;
                 t = object;
                 continue;
             }
         }
-        if (is_lvalue(t) && predicate(t)) return true;
+        if (op_is_lvalue(t->op) && predicate(t)) return true;
         t = without_members(t); // one access with its parts
         if (t->op == NAME) return false;
         if (any_lvalue_read(t->right, predicate)) return true;
@@ -197,12 +195,6 @@ SYMTAB* assigned_variable(const NODE* t) {
     return opcode_is_ASG(t->op) && t->left->op == NAME ? t->left->u.sym : nullptr;
 }
 
-bool may_leave_in_the_middle(const NODE* tree) {
-    return any_subtree(tree, [](const NODE* t) {
-        return op_is_call(t->op) || t->op == MCALL || t->op == UMCALL || t->op == ASM || (is_lvalue(t) && lvalue_is_volatile(t));
-    });
-}
-
 bool tree_acts(const NODE* tree) {
     return any_subtree(tree, [](const NODE* t) { return op_has_effect(t->op); });
 }
@@ -210,7 +202,7 @@ bool tree_acts(const NODE* tree) {
 bool tree_changes_nothing(const NODE* tree) {
     if (!tree_has_side_effects(tree)) return true;
     return !any_subtree(tree, [](const NODE* t) {
-        if (is_lvalue(t)) return lvalue_is_volatile(t);
+        if (op_is_lvalue(t->op)) return lvalue_is_volatile(t);
         return op_has_effect(t->op) && !(op_is_call(t->op) && !call_may_modify(t, nullptr));
     });
 }
@@ -243,6 +235,40 @@ const void* pure_callee(const NODE* call) {
     const void* callee = computing_callee(call, &reads_memory);
     return reads_memory ? nullptr : callee;
 }
+
+// ---- Control
+
+bool call_surely_returns(const NODE* call) {
+    FUNINFO* f = find_FUNINFO_for_call(call);
+    return f && TEST_FLAG(f, FUN_surely_returns) && !TEST_FLAG(f, FUN_never_returns);
+}
+
+static bool node_may_not_pass_control(const NODE* t) {
+    if (op_is_call(t->op)) return !call_surely_returns(t);
+    return t->op == UMCALL || t->op == ASM || (t->op == MCALL && !is_multiply_accumulate_MCALL(t));
+}
+
+bool node_may_stop_or_wait(const NODE* t) {
+    if (op_is_lvalue(t->op)) return lvalue_is_volatile(t);
+    return !op_is_call(t->op) && node_may_not_pass_control(t);
+}
+
+bool may_not_pass_control(const NODE* tree) { return any_subtree(tree, node_may_not_pass_control); }
+
+bool may_leave_in_the_middle(const NODE* tree) {
+    return any_subtree(tree, [](const NODE* t) { return node_may_not_pass_control(t) || node_may_stop_or_wait(t); });
+}
+
+bool may_trap(const NODE* tree) {
+    return any_subtree(tree, [](const NODE* t) {
+        const int op = opcode_is_ASG(t->op) ? op_of_opASG[t->op] : t->op;
+        if (op == DIV || op == MOD)
+            return t->right->op != ICON || t->right->u.lval.is_zero() || t->right->u.lval == INT65(-1);
+        return op_is_call(op) || op_is_intrinsic(op) || (op_is_indirection(op) && !is_access_by_name(t));
+    });
+}
+
+// ---- Modifications
 
 static bool tree_may_modify(const NODE* a, const COMPARED_LVALUE& lvalue) {
     return any_subtree(a, [&](const NODE* t) { return node_may_modify(t, lvalue); });
@@ -296,7 +322,7 @@ bool bb_modifies_lvalue_in_tree(const BBLK* bb, const NODE* t) {
 // Whether it may modify or read any lvalue, by more than being a part of an access.
 static bool acts_on_memory(const NODE* t) {
     if (writes_left_operand(t->op) || is_operation_on_memory(t->op) || t->op == ASM || t->op == ARGREF) return true;
-    if (is_lvalue(t)) return lvalue_is_volatile(t);
+    if (op_is_lvalue(t->op)) return lvalue_is_volatile(t);
     return op_has_effect(t->op) && !op_transfers_control(t->op) && !is_inert(t->op);
 }
 

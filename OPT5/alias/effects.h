@@ -82,10 +82,6 @@ inline bool left_names_variable(const NODE* t) {
 SYMTAB* assigned_variable(const NODE* t);
 // Whether evaluating `tree` does anything but compute a value; reading a volatile object is no act here.
 bool tree_acts(const NODE* tree);
-// Whether control may not come to what follows: a call that does not return, or an event that others outside the program
-// wait for.
-bool may_leave_in_the_middle(const NODE* tree);
-
 // Whether evaluating `tree` leaves all that a tree may read as it is: its only acts are calls that write nothing.
 bool tree_changes_nothing(const NODE* tree);
 // What a call, a CALL or an ICALL, computes by: the callee's symbol or the built-in's descriptor. Null unless it does
@@ -96,6 +92,28 @@ const void* computing_callee(const NODE* call, bool* reads_memory);
 
 // The outermost lvalues that a tree reads, and those that their addresses are computed from.
 std::vector<const NODE*> lvalues_read_in(const NODE* tree);
+
+// ---- Control
+//
+// What may trap is not evaluated where the program does not: it stays behind what may not pass control on, for `if (!b)
+// exit(3);` comes ahead of a / b, and behind events outside the program, which others may see first or which never come.
+// A callee that may trap itself holds nothing back. Where it traps, the run has no defined end that an earlier trap would
+// change: the call is one of those that are certain to come back otherwise, and nothing outside sees what they do.
+
+// Whether a CALL or UCALL comes back for certain, in finite time and without an event outside the program: then it is as an
+// assignment to what follows.
+bool call_surely_returns(const NODE* call);
+// One node, its operands and the callee of a call aside: an operation of the machine, but for those that multiply and
+// accumulate, assembly, or a volatile access.
+bool node_may_stop_or_wait(const NODE* t);
+// Whether control may not come to what follows evaluating the tree.
+bool may_not_pass_control(const NODE* tree);
+// The same, or an event outside the program is part of it: what may trap does not move ahead of it, and stores ahead of it
+// are made.
+bool may_leave_in_the_middle(const NODE* tree);
+// Whether evaluating the tree where the program does not may end it, or keep control: a quotient, unless by a constant
+// other than 0 and -1, a load through a pointer, a call.
+bool may_trap(const NODE* tree);
 
 // ---- Changes
 

@@ -32,8 +32,6 @@ void tell_of_loops(struct LOOP* root);
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
 bool sink_unused_definitions(struct LOOP* loop);
-// Whether evaluating the tree where the program does not may end it: a quotient, or a load through a pointer.
-bool may_trap(const NODE* t);
 // Places that innermost loops write, and whose address stays, get pointers of their own (invariant_places.cpp).
 void name_invariant_places(struct LOOP* root);
 void undeltafy_dd_loops(struct LOOP* loop);

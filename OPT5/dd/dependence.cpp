@@ -81,8 +81,6 @@ struct LOOP* get_loop_from_DDEPNODE_tree(const NODE* t) {
 
 namespace {
 
-bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
-
 // In units behind the address of the UMULT; false where that is not known. A bit-field is written with the unit around.
 bool extent_of(const NODE* t, EXTENT* extent) {
     int64_t size = static_cast<int64_t>(t->type->size), bits = 0;
@@ -172,7 +170,7 @@ private:
 int sign_of(int v) { return (v > 0) - (v < 0); }
 
 void require_lvalue(const NODE* t) {
-    if (!is_lvalue(t)) optassert("is_lvalue(tree)", __FILE__, __LINE__);
+    if (!op_is_lvalue(t->op)) optassert("is_lvalue(tree)", __FILE__, __LINE__);
 }
 
 bool is_in_irreducible_code(const struct LOOP* l1, const struct LOOP* l2) {

@@ -22,10 +22,8 @@ struct LOOP* loop_of(const NODE* place, struct LOOP* otherwise) {
     return loop ? loop : otherwise;
 }
 
-bool is_lvalue(const NODE* t) { return t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF; }
-
 bool places_meet(const NODE* x, const NODE* y, const LOOPS& in) {
-    if (!is_lvalue(x) || !is_lvalue(y)) return true;
+    if (!op_is_lvalue(x->op) || !op_is_lvalue(y->op)) return true;
     if (x == y || (x->op == NAME && y->op == NAME && x->u.sym == y->u.sym)) return true;
     if (!in.l1 || !in.l2) return lvalues_may_be_aliased(x, y, loop_root());
     if (in.sameIteration && in.l1 == in.l2 && !in.l1->is_root()) return lvalues_collide_in_iteration(x, y, in.l1);
@@ -37,7 +35,7 @@ template <class F>
 bool any_access(const NODE* t, const F& visit) {
     if (!t) return false;
     if (t->op == NAME) return visit(t);
-    if (t->op == STDOT || t->op == UMULT || t->op == STREF) {
+    if (op_is_load(t->op)) {
         if (visit(t)) return true;
         const NODE* object = without_members(t);
         return object->op != NAME &&
@@ -65,7 +63,7 @@ bool write_reaches(const WRITE& w, const NODE* t, const LOOPS& in) {
     return any_subtree(t, [x](const NODE* n) { return acts_on_memory(n) && (!x || call_may_access(n, x)); });
 }
 
-bool is_volatile_access(const NODE* t) { return is_lvalue(t) && lvalue_is_volatile(t); }
+bool is_volatile_access(const NODE* t) { return op_is_lvalue(t->op) && lvalue_is_volatile(t); }
 
 } // namespace
 

@@ -102,7 +102,7 @@ bool is_induction_update(const NODE* t, INDUCTION_UPDATE* u) {
 namespace {
 
 bool reads_memory(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) { return n->op == UMULT || n->op == STREF; });
+    return any_subtree(t, [](const NODE* n) { return op_is_indirection(n->op); });
 }
 
 bool may_be_IV(const INDUCTION_UPDATE& u, const struct LOOP* loop) {

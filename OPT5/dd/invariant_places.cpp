@@ -10,6 +10,7 @@
 #include "OPT5/dd/dd.h"
 
 #include "OPT5/alias/alias.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/facts.h"

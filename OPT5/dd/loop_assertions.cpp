@@ -282,13 +282,8 @@ bool stays_true(const NODE* t, struct LOOP* loop) {
     return holds_on(t->op, t->left, t->right) || holds_on(commute_inv[t->op], t->right, t->left);
 }
 
-bool may_not_return(const NODE* t) {
-    return any_subtree(
-        t, [](const NODE* n) { return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM; });
-}
-
 void find_assertions_in_head(struct LOOP* loop) {
-    for (const LIST* s = loop->head->statements; s && s->rest && !may_not_return(s->first); s = s->rest) {
+    for (const LIST* s = loop->head->statements; s && s->rest && !may_not_pass_control(s->first); s = s->rest) {
         const NODE* condition = asserted_condition(s->first);
         if (!condition) continue;
         const bool always = is_ANTIALIASED_ICALL(condition) || expr_is_constant(condition) ||

@@ -12,6 +12,7 @@
 
 #include "OPT5/dd/trip.h"
 
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
@@ -142,19 +143,13 @@ void refine_loop_highlow(struct LOOP* loop) {
 
 namespace {
 
-bool may_not_come_back(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) {
-        return op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM || n->op == ASSERT;
-    });
-}
-
 // Innermost loops alone: one in it may never end.
 bool always_comes_to_its_end(const struct LOOP* loop) {
-    if (loop->is_root() || loop->has(LOOP_has_call)) return false;
+    if (loop->is_root()) return false;
     for (const BBLK* bb : loop->contents) {
         if (bb->loop != loop) return false;
         for (const LIST* s = bb->statements; s; s = s->rest)
-            if (may_not_come_back(s->first)) return false;
+            if (may_not_pass_control(s->first) || tree_contains_op(s->first, ASSERT)) return false;
     }
     return true;
 }

@@ -25,7 +25,7 @@ namespace {
 
 bool is_sum_in_memory(const NODE* t) {
     if (t->op != PLUSASG && t->op != MINUSASG) return false;
-    if (t->left->op != UMULT && t->left->op != STREF && t->left->op != STDOT && t->left->op != NAME) return false;
+    if (!op_is_lvalue(t->left->op)) return false;
     if (!t->left->type->is_scalar() || lvalue_is_volatile(t->left) || tree_has_side_effects(t->left)) return false;
     return !is_a_likely_zelkova_accumulator(t->left, false) && is_a_zelkova_accumulator_type(t->left->type, false);
 }
@@ -35,12 +35,9 @@ bool has_plain_address(const NODE* place) {
     place = without_members(place);
     if (place->op == NAME) return true;
     auto reads_memory = [](const NODE* t) {
-        bool reads = false;
-        for_each_subtree(t, [&reads](const NODE* n) {
-            reads |= n->op == UMULT || n->op == STREF || n->op == STDOT ||
-                     (n->op == NAME && !n->type->is_array() && !is_private_name(n));
+        return any_subtree(t, [](const NODE* n) {
+            return op_is_load(n->op) || (n->op == NAME && !n->type->is_array() && !is_private_name(n));
         });
-        return reads;
     };
     return !reads_memory(place->left) && !(place->right && reads_memory(place->right));
 }

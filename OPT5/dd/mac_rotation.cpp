@@ -61,7 +61,7 @@ int count_multiplies(const NODE* t, bool in_address) {
     int count = 0;
     for (; t; t = t->left) {
         count += t->op == MULT && !(in_address && is_scaled_subscript(t));
-        in_address |= t->op == UMULT || t->op == STREF;
+        in_address |= op_is_indirection(t->op);
         count += count_multiplies(t->right, in_address);
     }
     return count;

@@ -188,7 +188,7 @@ NODE* SPECULATION::test_ahead() const {
     std::vector<const NODE*> names;
     for_each_subtree(condition, [&](const NODE* n) {
         if (n->op == NAME) names.push_back(n);
-        is_simple &= n->op != UMULT && n->op != STREF && n->op != STDOT && !op_is_call(n->op) && !lvalue_is_volatile(n);
+        is_simple &= !op_is_load(n->op) && !op_is_call(n->op) && !lvalue_is_volatile(n);
     });
     if (!is_simple) return nullptr;
     NODE* ahead = copy_tree(condition);

@@ -81,7 +81,7 @@ void SUBSCRIPTS::step(int count) {
         if (!t) return;
         PRODUCT p;
         if (in_address && read(t, &p)) return found.emplace_back(link, p), void();
-        in_address |= t->op == UMULT || t->op == STREF;
+        in_address |= op_is_indirection(t->op);
         self(self, &t->left, in_address);
         self(self, &t->right, in_address);
     };

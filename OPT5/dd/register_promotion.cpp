@@ -72,7 +72,7 @@ bool is_candidate(const SSAVAR* v) {
 // form here.
 bool names_memory(const NODE* statement) {
     return any_subtree(statement, [](const NODE* t) {
-        if (t->op == UMULT || t->op == STREF) return true;
+        if (op_is_indirection(t->op)) return true;
         if (t->op != NAME || !t->u.sym || t->u.sym->is_function() || t->u.sym->level == 1) return false;
         const SYMTAB* sym = t->u.sym;
         const bool is_register = sym->level != 0 && sym->is_automatic() && !may_be_reached_by_pointers(sym);

@@ -6,9 +6,10 @@
 //
 // Needs: SSA form, as the loads left it. Leaves: nothing of what rests on the graph.
 // Sound because what is inserted lies behind a store on every path, with nothing between that touches the place, so that
-// nothing is stored where nothing was, and a store is removed only where another follows on every path. A call, assembly and a
-// volatile access end such a path, and so do a statement that an exception may leave and a return; a block from which
-// control does not come to the end of the function keeps its stores. Constant objects are not written at all.
+// nothing is stored where nothing was, and a store is removed only where another follows on every path. A call that may not
+// return, assembly and a volatile access end such a path, and so do a statement that an exception may leave and a return; a
+// block from which control does not come to the end of the function keeps its stores. Constant objects are not written at
+// all.
 #include "OPT5/dd/register_promotion.h"
 
 #include "OPT5/alias/alias.h"
@@ -122,7 +123,7 @@ SUMMARY STORE_PROMOTER::summary_of(LIST* cell, size_t block) {
             if (in.empty() || in.back() != statements.size()) in.push_back(statements.size());
             s.is_memory |= !n->u.sym->is_function() && !only_its_name_reaches(n->u.sym);
         }
-        s.is_indirect |= n->op == UMULT || n->op == STREF || op_is_intrinsic(n->op);
+        s.is_indirect |= op_is_indirection(n->op) || op_is_call(n->op) || op_is_intrinsic(n->op);
     });
     return s;
 }

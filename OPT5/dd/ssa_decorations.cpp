@@ -30,7 +30,7 @@ const NODE* only_lvalue(const NODE* condition) {
     int count = 0;
     const bool is_plain = !any_subtree(condition, [&](const NODE* t) {
         if (op_has_effect(t->op) || op_is_call(t->op) || op_is_intrinsic(t->op) || t->op == UAND) return true;
-        if (t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF) {
+        if (op_is_lvalue(t->op)) {
             ++count;
             found = t;
         }

@@ -109,33 +109,6 @@ bool is_plain(const TYPE* t) {
     return ((t->is_int() && !t->is_bool()) || t->is_float() || t->is_pointer()) && !t->is_complex();
 }
 
-bool is_load(int op) { return op == UMULT || op == STREF || op == STDOT; }
-
-// An object, or a part of one: it is there.
-bool is_named(const NODE* access) {
-    access = without_members(access);
-    return name_accessed(access) != nullptr;
-}
-
-} // namespace
-
-bool may_trap(const NODE* t) {
-    return any_subtree(t, [](const NODE* n) {
-        if (n->op == DIV || n->op == MOD)
-            return n->right->op != ICON || n->right->u.lval.is_zero() || n->right->u.lval == INT65(-1);
-        return (n->op == UMULT || n->op == STREF) && !is_named(n);
-    });
-}
-
-namespace {
-
-// Control may leave it for good, or for an unknown time.
-bool may_not_return(const NODE* statement) {
-    return any_subtree(statement, [](const NODE* n) {
-        return op_is_call(n->op) || op_is_intrinsic(n->op) || n->op == ASM || n->op == MEMCPY;
-    });
-}
-
 bool computes(int op) {
     return op_is_arithmetic(op) || boolean_result[op] || op == SCONV || op == PCONV || op == DIV || op == MOD;
 }
@@ -173,7 +146,7 @@ private:
     bool operands_hold(const NODE* t, struct LOOP* loop) {
         t = without_members(t);
         if (t->op == NAME) return true;
-        if (t->op == UMULT || t->op == STREF)
+        if (op_is_indirection(t->op))
             return holds(t->left, loop) && (!t->right || t->right->op == FIELD || holds(t->right, loop));
         return op_is_SSA(t->op) && holds(t, loop);
     }
@@ -237,7 +210,7 @@ public:
         if (known == 0) {
             known = 1;
             for (const LIST* s = bb->statements; s && known > 0; s = s->rest)
-                if (may_not_return(s->first)) known = -1;
+                if (may_leave_in_the_middle(s->first)) known = -1;
         }
         return known > 0;
     }
@@ -278,7 +251,7 @@ public:
             if (!bb->loop || bb->loop->is_root()) continue;
             is_certain_here = certainty.holds_at_start(bb);
             for (LIST* s = bb->statements; s; s = s->rest) {
-                is_certain_here = is_certain_here && !may_not_return(s->first);
+                is_certain_here = is_certain_here && !may_leave_in_the_middle(s->first);
                 statement(s, bb);
             }
         }
@@ -328,7 +301,7 @@ private:
             return;
         }
         if (t->left)
-            op_is_SSA(t->op) || writes_left_operand(t->op) || is_load(t->op) ? place(&t->left, t) : visit(&t->left);
+            op_is_SSA(t->op) || writes_left_operand(t->op) || op_is_load(t->op) ? place(&t->left, t) : visit(&t->left);
         const bool was_conditional = is_conditional;
         is_conditional |= t->op == QUEST || t->op == ANDAND || t->op == OROR;
         if (t->right && t->right->op != FIELD) visit(&t->right);
@@ -351,10 +324,10 @@ private:
     static bool is_candidate(const NODE* t) {
         if (!is_small(t)) return false;
         const NODE* access = below_SSA(t);
-        if (access->op == NAME || op_is_SSA_definition(t->op) || is_named(access) || !is_plain(t->type)) return false;
+        if (access->op == NAME || op_is_SSA_definition(t->op) || is_access_by_name(access) || !is_plain(t->type)) return false;
         // An address that is kept in a variable would let the object be reached by pointers.
         if (!good_CSE_tree(access, false) || (t->type->is_pointer() && tree_contains_op(t, UAND))) return false;
-        if (!is_load(access->op) && !computes(access->op)) return false;
+        if (!op_is_load(access->op) && !computes(access->op)) return false;
         return !is_of_variables(t);
     }
 
@@ -366,7 +339,7 @@ private:
     // `hoist_invariants` moves it, once the inductions that it may be a part of are found.
     static bool is_of_variables(const NODE* t) {
         return !any_subtree(t, [](const NODE* n) {
-            return is_load(n->op) || (n->op == NAME && !is_private_name(n)) ||
+            return op_is_load(n->op) || (n->op == NAME && !is_private_name(n)) ||
                    ((n->op == DIV || n->op == MOD) && n->right->op != ICON) || boolean_result[n->op];
         });
     }

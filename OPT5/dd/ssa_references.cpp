@@ -18,7 +18,6 @@
 
 namespace {
 
-bool is_access(int op) { return op == NAME || op == UMULT || op == STDOT || op == STREF; }
 
 // Other than as the root of a statement.
 bool writes_within(const NODE* t) {
@@ -103,11 +102,11 @@ void WRAPPER::access(NODE** link) {
     if (is_left_bare(t)) return;
     SSAVAR* v = SSAVAR_for_reference(t, build);
     NODE** base = link_without_members(link);
-    if (is_access((*base)->op))
+    if (op_is_lvalue((*base)->op))
         operands_of_place(base);
     else
         value(base); // a member of a value
-    if (!v) return is_access((*base)->op) ? note_untracked(t) : void();
+    if (!v) return op_is_lvalue((*base)->op) ? note_untracked(t) : void();
     if (v->is_memory() && !is_operand_of_only_write && count_writes() > 0) return;
     *link = make_SSA_USE(t, v, nullptr);
     site(SSA_SITE::USE, link, *link);
@@ -138,7 +137,7 @@ void WRAPPER::write_within(NODE** link) {
 void WRAPPER::value(NODE** link) {
     for (; *link;) {
         NODE* t = *link;
-        if (is_access(t->op)) return access(link);
+        if (op_is_lvalue(t->op)) return access(link);
         if (t->op == ARGREF) note_untracked(t->left); // the callee writes it
         if (t->op == UAND || t->op == ARGREF) return operands_of_place(&t->left);
         if (t->op == PPRAGMA || t->op == LABELREF) return;
@@ -156,7 +155,7 @@ void WRAPPER::assignment(NODE** link) {
         if (t->left->type->is_pointer()) site(SSA_SITE::WRITE, link, t); // what is behind it is another place then
         return;
     }
-    SSAVAR* v = is_access(t->left->op) ? SSAVAR_for_reference(t->left, build) : nullptr;
+    SSAVAR* v = op_is_lvalue(t->left->op) ? SSAVAR_for_reference(t->left, build) : nullptr;
     operands_of_place(&t->left);
     if (!v) {
         effects::visit_places(t, t->left, [this](const WRITE& w) { note_untracked(w.place); });

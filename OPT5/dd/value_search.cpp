@@ -239,7 +239,7 @@ NODE* SEARCH::behind_loop(SYMTAB* sym, struct LOOP* loop, int depth) {
 NODE* SEARCH::resolved(NODE* copy, POINT at, int depth) {
     bool is_known = count_nodes_in_tree(copy) <= MOST_NODES && !tree_has_side_effects(copy) &&
                     !any_subtree(copy, [](const NODE* n) {
-                        return n->op == UMULT || n->op == STREF || n->op == STDOT || op_is_call(n->op);
+                        return op_is_load(n->op) || op_is_call(n->op);
                     });
     if (is_known && copy->op == UAND) return copy;
     NODE* t = !is_known ? copy : rewrite_tree(copy, [&](NODE* n) {

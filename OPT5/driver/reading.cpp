@@ -47,6 +47,7 @@ const ROW rows[] = {
     {F,     "first simpcfg",               nullptr, always, [] { simpcfg(0, 0); }, none, graph},
     {F,     "first fast_CP",               nullptr, L1, [] { fast_CP(4, 1); }, alias_marks, graph | alias_marks},
     {FIXED, "scan definition",             nullptr, always, [] { preprocess_fundef(currfuninfo); }, none, graph},
+    {F,     "does it return",              nullptr, L1, see_whether_body_returns, none, fact::every},
     {FIXED, "call sites",                  nullptr, always, size_site_sets, none, fact::every},
     {F,     "parameters",                  nullptr, always, init_ipcp_for_fun, none, fact::every},
     {IDLE,  "parameters by metavalues",    nullptr, [] { return do_IP_MVP; }, init_IP_MVP_for_current_function, none, none},

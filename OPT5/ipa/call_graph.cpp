@@ -220,6 +220,7 @@ void set_up_and_build_call_graph() {
     const std::vector<FUNINFO*> list = defined_functions();
     add_synonym_edges();
     close_guarantees(list);
+    close_returns(list);
     add_anonymous_edges(list);
     for (FUNINFO* f : list) classify_callees(f);
     check_program_mode();

@@ -63,6 +63,10 @@ void scan_for_funinfo(NODE* initializer_item);
 void check_fun_for_byref_asgs(SYMTAB* sym); // drops the guarantee about parameters where no parameter is a pointer
 void add_call_edge(FUNINFO* caller, FUNINFO* callee, bool value_unused);
 bool propagate_call_flags(FUNINFO* caller, FUNINFO* callee); // whether the caller's flags changed; null: anything
+// Sets FUNINFO::body_returns of the current function, whose graph is built; then, of all functions of the list, the flag
+// FUN_surely_returns. Their callees are entered (returns.cpp).
+void see_whether_body_returns();
+void close_returns(const std::vector<FUNINFO*>& functions);
 // A body that only passes its parameters on to another function makes the two synonyms.
 void check_for_synonym_function_in_pass_1();
 bool is_synonym_function(const FUNINFO* f);

@@ -178,7 +178,7 @@ private:
         if (t->op == ASG) {
             if (NODE* object = name_of_place(target))
                 target = object;
-            else if (target->op == UMULT || target->op == STREF)
+            else if (op_is_indirection(target->op))
                 target = target->left;
         }
         tree(target, false);

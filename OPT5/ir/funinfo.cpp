@@ -34,7 +34,8 @@ std::unordered_set<const SYMTAB*> nonconforming_functions;
 
 const std::unordered_map<std::string, uint64_t>& system_functions() {
     constexpr uint64_t NO_GLOBALS = FUN_no_global_asg | FUN_no_global_use, NO_IND_ASG = FUN_no_ind_asg,
-                       NO_IND_USE = FUN_no_ind_use, NO_BYREF_ASG = FUN_no_byref_asg, PURE = FUN_is_pure_fun;
+                       NO_IND_USE = FUN_no_ind_use, NO_BYREF_ASG = FUN_no_byref_asg, PURE = FUN_is_pure_fun,
+                       RETURNS = FUN_surely_returns;
     static const std::unordered_map<std::string, uint64_t> table = {
 #define SYSTEM_FUNCTION(name, flags) {#name, flags},
 #include "OPT5/ir/system_functions.def"
@@ -202,7 +203,7 @@ constexpr FLAG_NAME flag_names[] = {
     FLAG(FUN_no_byref_asg),    FLAG(FUN_is_pure_fun),     FLAG(FUN_cannot_beta),     FLAG(FUN_no_RPT_loop),
     FLAG(FUN_is_inlined),      FLAG(FUN_no_ind_asg),      FLAG(FUN_no_ind_use),      FLAG(FUN_is_cg_root),
     FLAG(FUN_is_called),       FLAG(FUN_is_extern),       FLAG(FUN_is_SYSTEM),       FLAG(FUN_has_1_BB),
-    FLAG(FUN_is_main),         FLAG(FUN_is_cpp),
+    FLAG(FUN_is_main),         FLAG(FUN_is_cpp),          FLAG(FUN_only_reads),      FLAG(FUN_surely_returns),
 };
 #undef FLAG
 

@@ -65,6 +65,8 @@ enum FUN_FLAG : uint64_t {
     FUN_is_cpp = 0x80000000,
     // As a pure one, it only computes, the same each time; but from memory also, which others may change in between.
     FUN_only_reads = 0x100000000,
+    // Control comes back from each call of it, in finite time, and no event outside the program is part of it.
+    FUN_surely_returns = 0x200000000,
 };
 
 struct CALLEE {
@@ -129,6 +131,7 @@ public:
     uint32_t sites_left = 0;
     uint32_t est_time = 0, est_bbs = 0, est_syms = 0, est_loops = 0, est_ncalls = 0, est_pressure = 0, density = 0;
     bool is_leaf_estimate = false, irreducible = false;
+    bool body_returns = false; // FUN_surely_returns holds if it does for all its callees
     int bb_count = 0;
     BBLK* bb_list = nullptr;
     BBLK* exit_bb = nullptr;

@@ -46,6 +46,10 @@ constexpr bool op_is_SSA(int op) { return op >= SSA_PHI && op <= SSA_CHI; }
 constexpr bool op_wraps_for_SSA(int op) { return op >= SSA_USE && op <= SSA_CHI; } // stands for its operand
 constexpr bool op_is_float_compare(int op) { return op >= FEQ && op <= FUNO; }
 constexpr bool op_is_int_compare(int op) { return op >= EQ && op <= UGT; }
+// Accesses: an object by its name, something behind a pointer, a member of one of them.
+constexpr bool op_is_indirection(int op) { return op == UMULT || op == STREF; }
+constexpr bool op_is_load(int op) { return op_is_indirection(op) || op == STDOT; }
+constexpr bool op_is_lvalue(int op) { return op_is_load(op) || op == NAME; }
 constexpr bool op_is_call(int op) { return op == CALL || op == UCALL; }
 constexpr bool op_is_intrinsic(int op) { return op == ICALL || op == UICALL || op == MCALL || op == UMCALL; }
 // Arithmetic on the values of one or two operands: sums, products, quotients, bits, shifts, and what takes one number.

@@ -48,7 +48,7 @@ bool tree_has_side_effects(const NODE* t) {
             const NODE* object = without_members(static_cast<const NODE*>(t->left));
             if (object->op == NAME) return false;
             // The address of an indirection is computed, the indirection is not.
-            t = object->op == UMULT || object->op == STREF ? object->left : object;
+            t = op_is_indirection(object->op) ? object->left : object;
             continue;
         }
         case UMULT:
@@ -441,7 +441,7 @@ SYMTAB* object_name_if_known(const NODE* t) {
     while (t && (is_transparent(t->op) || is_part(t->op) || op_wraps_for_SSA(t->op))) t = t->left;
     if (!t) return nullptr;
     if (t->op == NAME) return t->u.sym;
-    return t->op == STREF || t->op == UMULT ? pointee_name_if_known(t->left) : nullptr;
+    return op_is_indirection(t->op) ? pointee_name_if_known(t->left) : nullptr;
 }
 
 // ---- Substitution
@@ -472,8 +472,6 @@ NODE* subst_sym_pairs_in_tree(NODE* t, const SYMPAIRLIST* pairs) {
     return t;
 }
 
-static bool is_lvalue_op(int op) { return op == NAME || op == UMULT || op == STDOT || op == STREF; }
-
 NODE* subst_tree_for_lvalue_in_tree(const NODE* replacement, const NODE* lvalue, NODE* t) {
     if (!t) return nullptr;
     if (trees_are_congruent_se_ok(t, lvalue)) {
@@ -484,7 +482,7 @@ NODE* subst_tree_for_lvalue_in_tree(const NODE* replacement, const NODE* lvalue,
     }
     bool needs_lvalue = opcode_is_ASG(t->op) || t->op == UAND || t->op == ARGREF || t->op == STARG || t->op == STDOT;
     bool keeps_left =
-        needs_lvalue && t->left && !is_lvalue_op(replacement->op) && trees_are_congruent_se_ok(t->left, lvalue);
+        needs_lvalue && t->left && !op_is_lvalue(replacement->op) && trees_are_congruent_se_ok(t->left, lvalue);
     if (!keeps_left) t->left = subst_tree_for_lvalue_in_tree(replacement, lvalue, t->left);
     t->right = subst_tree_for_lvalue_in_tree(replacement, lvalue, t->right);
     return t;

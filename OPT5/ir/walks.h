@@ -116,3 +116,6 @@ N* without_members(N* t, int64_t* offset) {
     for (; t->op == STDOT; t = t->left) *offset += static_cast<int64_t>(t->right->mval->offset);
     return t;
 }
+
+// Whether an access is one of an object, or a member of one, by its NAME: it is there.
+inline bool is_access_by_name(const NODE* t) { return name_accessed(without_members(t)) != nullptr; }

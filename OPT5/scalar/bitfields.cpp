@@ -119,7 +119,7 @@ SPAN span_of(const fkMDATA* m, const TYPE* csu, bool is_volatile) {
 // Whether the address of what a member is selected from can be taken.
 bool is_place(const NODE* t) {
     t = without_members(t);
-    return t->op == NAME || t->op == UMULT || t->op == STREF;
+    return t->op == NAME || op_is_indirection(t->op);
 }
 
 // What a local structure becomes: a variable for each member by its ordinal, or one for all.

@@ -25,7 +25,7 @@ constexpr size_t MAX_PASSED = 16; // statements that an assignment is moved over
 
 bool reads_memory(const NODE* t) {
     return tree_contains_matching_node(t, [](const NODE* n) {
-        return n->op == UMULT || n->op == STREF || n->op == STDOT || (n->op == NAME && !n->type->is_scalar());
+        return op_is_load(n->op) || (n->op == NAME && !n->type->is_scalar());
     });
 }
 

@@ -407,9 +407,9 @@ TRIPLE ANNOTATOR::new_triple(int number) {
     t.sites = {all_sites.data() + e.begin, all_sites.data() + e.end};
     t.tree = *t.sites.front().slot;
     t.cost = e.cost;
+    t.may_trap = may_trap(t.tree);
     for_each_subtree(static_cast<const NODE*>(t.tree), [&t](const NODE* n) {
-        if (n->op == DIV || n->op == MOD || n->op == CALL || n->op == ICALL) t.may_trap = true;
-        if (n->op == UMULT || n->op == STREF) t.may_trap = t.reads_memory = true;
+        if (op_is_indirection(n->op)) t.reads_memory = true;
         if (n->op == CALL && !pure_callee(n)) t.reads_memory = t.is_asked_whole = true;
         if (n->op != NAME || !n->u.sym || n->u.sym->is_function()) return;
         if (!only_its_name_reaches(n->u.sym)) // an address of it costs nothing to ask about

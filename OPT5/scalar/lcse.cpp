@@ -49,8 +49,6 @@ constexpr int MOST_NODES = 64; // of a tree that is worth looking for
 constexpr int MOST_MIXED_NODES = 256; // of a statement whose effects stand among its reads: each read is asked about each
 constexpr double COST_OF_ASSIGNMENT = 1;
 
-bool op_is_load(int op) { return op == UMULT || op == STDOT || op == STREF; }
-
 bool is_assignment_of_private_name(const NODE* t) {
     return (t->op == ASG || is_operator_assignment(t)) && is_private_name(t->left) && !tree_has_side_effects(t->right);
 }
@@ -278,18 +276,6 @@ bool effects_are_known(const NODE* statement) {
     });
 }
 
-bool may_not_pass_control(const NODE* tree) {
-    return any_subtree(tree, [](const NODE* t) {
-        return op_is_call(t->op) || ((op_is_load(t->op) || t->op == NAME) && lvalue_is_volatile(t));
-    });
-}
-
-bool may_trap(const NODE* tree) {
-    return any_subtree(tree, [](const NODE* t) {
-        return t->op == DIV || t->op == MOD || t->op == UMULT || t->op == STREF || op_is_call(t->op);
-    });
-}
-
 // What the statement evaluates ahead of its own effect, if that is the last one.
 std::vector<const NODE*> operands_with_effects(const NODE* t) {
     const bool is_call = (t->op == ASG || t->op == STASG) && t->right->op == CALL; // made last
@@ -443,7 +429,7 @@ void COMMON_SUBEXPRESSIONS::mixed_statement(NODE* t) {
     auto mark = [this](const NODE* operand) { unCSEable.insert(operand); };
     mark_unCSEable_opds(t->left, effects, mark);
     mark_unCSEable_opds(t->right, effects, mark);
-    keeps_traps = std::any_of(effects.begin(), effects.end(), may_not_pass_control);
+    keeps_traps = std::any_of(effects.begin(), effects.end(), may_leave_in_the_middle);
     if (is_test) {
         read_operands(t->left, true);
     } else if (t->op == ASG && t->right->op == CALL) {

@@ -243,7 +243,7 @@ NODE* LOCAL_ASGS::parts_in(NODE* t) {
 // The place is not read, but a pointer that its address is computed from is.
 NODE* LOCAL_ASGS::parts_in_place(NODE* t) {
     auto* object = const_cast<NODE*>(get_first_non_stdot_node_down_the_left_side_of_tree(t));
-    if (object->op == UMULT || object->op == STREF) object->left = parts_in(object->left);
+    if (op_is_indirection(object->op)) object->left = parts_in(object->left);
     if (object->op == UMULT) object->right = parts_in(object->right);
     return t;
 }

@@ -75,7 +75,7 @@ public:
 private:
     // The parts of a written lvalue that are evaluated: not its own read.
     NODE* address(NODE* lvalue) {
-        if (lvalue->op == UMULT || lvalue->op == STREF)
+        if (op_is_indirection(lvalue->op))
             lvalue->left = value(lvalue->left);
         else if (lvalue->op == STDOT)
             lvalue->left = address(lvalue->left);

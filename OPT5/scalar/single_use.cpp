@@ -86,7 +86,7 @@ private:
     bool reads_variables_alone(const NODE* value) {
         bool alone = true;
         for_each_subtree(value, [&](const NODE* t) {
-            if (t->op == UMULT || t->op == STREF || t->op == STDOT || (t->op == NAME && !counts_of(t->u.sym)))
+            if (op_is_load(t->op) || (t->op == NAME && !counts_of(t->u.sym)))
                 alone = false;
         });
         return alone;

@@ -162,7 +162,7 @@ private:
     void look_at(NODE* t) {
         for_each_node(t, [this](const NODE* n) {
             if (n->op == NAME) barred.insert(n->u.sym);
-            if (n->op == UMULT || n->op == STREF) reached = true;
+            if (op_is_indirection(n->op)) reached = true;
             if (op_is_call(n->op) || n->op == MCALL || n->op == UMCALL || n->op == ASM || n->op == MEMCPY)
                 goes_on = false;
         });

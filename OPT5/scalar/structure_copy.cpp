@@ -37,7 +37,7 @@ bool is_steady_place(const NODE* t) {
     if (type_may_contain_volatile(t->type) || lvalue_is_volatile(t)) return false;
     t = without_members(t);
     if (t->op == NAME) return true;
-    return (t->op == UMULT || t->op == STREF) && (t->op == STREF || !t->right) && is_steady_pointer(t->left);
+    return op_is_indirection(t->op) && (t->op == STREF || !t->right) && is_steady_pointer(t->left);
 }
 
 void copy_by_members(const NODE* to, const NODE* from, std::vector<NODE*>* copies) {

@@ -60,7 +60,7 @@ private:
 bool is_pure_within(const NODE* t, int* nodes_left) {
     for (; t; t = t->left) {
         if (--*nodes_left < 0 || op_has_effect(t->op) || op_is_intrinsic(t->op)) return false;
-        if ((t->op == NAME || t->op == UMULT || t->op == STDOT || t->op == STREF) && lvalue_is_volatile(t))
+        if (op_is_lvalue(t->op) && lvalue_is_volatile(t))
             return false;
         if (!is_pure_within(t->right, nodes_left)) return false;
     }

@@ -22,7 +22,7 @@ NODE* peel_operands(NODE* t) {
 // The object whose address is taken isn't read; a pointer that leads to it is.
 NODE* peel_address(NODE* t) {
     NODE* object = t->left = taken_out_of_members(t->left);
-    if (object->op == UMULT || object->op == STREF) {
+    if (op_is_indirection(object->op)) {
         t->left = object->left;
         if (object->right) erase_tree(object->right);
         erase_node(object);

@@ -25,7 +25,7 @@ bool is_pure_within(const NODE* t, int* budget) {
         case UAND: // the address of what a pointer leads to is computed, what is there isn't read
             t = without_members(static_cast<const NODE*>(t->left));
             if (t->op == NAME) return true;
-            if (t->op == UMULT || t->op == STREF) {
+            if (op_is_indirection(t->op)) {
                 if (t->op == UMULT && t->right && !is_pure_within(t->right, budget)) return false;
                 t = t->left;
             }

@@ -37,10 +37,162 @@ void stop(int x) {
     g = x;
 }
 
+// ---- A quotient is made ahead of a call that comes back for certain, and of no other.
+
+int a[16], zero;
+volatile int port;
+int (*pointer)(int);
+extern double sqrt(double);
+
+int counts(int n) {
+    int i, s = 0;
+    for (i = 0; i < n; i++) s += a[i & 15];
+    g++;
+    return s;
+}
+int counts_down(int k) {
+    unsigned n = k & 15;
+    int s = 0;
+    while (n--) s += a[n];
+    for (n = 9; n > 2u; --n) g += a[n];
+    return s;
+}
+int walks(int k) {
+    const int *p = a + (k & 7), *e = a + 16;
+    while (p != e) g += *p++;
+    return (int)labs(k) + counts_down(k);
+}
+int may_exit(int y) {
+    if (y) exit(0);
+    return g;
+}
+int calls_it(int y) { return may_exit(y) + 1; }
+int never_ends_at_top(int k) { // for 65535
+    unsigned i, limit = k;
+    for (i = 0; i <= limit; i++) g++;
+    return g;
+}
+int skips_the_end(int k) { // for odd ones
+    unsigned i;
+    for (i = 0; i != (unsigned)k; i += 2) g++;
+    return g;
+}
+int steps_now_and_then(int k) {
+    int i = 0;
+    while (i < k)
+        if (a[g & 15]) i++;
+    return i;
+}
+int steps_back(int k) {
+    int i;
+    for (i = 0; i < k; i++)
+        if (a[i]) i--;
+    return i;
+}
+int other_variable(int k) {
+    int i = 0;
+    while (k != g) i++;
+    return i;
+}
+int jumps_in(int k) {
+    int i = 0;
+    if (k) goto in;
+    for (; i < 9; i++) {
+    in:
+        if (a[i]) goto in;
+    }
+    return i;
+}
+int is_odd(int k);
+int is_even(int k) { return k ? is_odd(k - 1) : 1; }
+int is_odd(int k) { return k ? is_even(k - 1) + g : 0; }
+int by_pointer(int k) { return pointer(k); }
+int waits(int k) { return port + k; }
+int prints(int k) {
+    put_i16(k);
+    return k;
+}
+int stops(int k) {
+    __asm(" NOP");
+    return k;
+}
+
+#define LOOP(callee)                                                                                                   \
+    int in_##callee(int n, int x, int y) {                                                                             \
+        int i, s = 0;                                                                                                  \
+        for (i = 0; i < n; i++) {                                                                                      \
+            s += callee(y ? 0 : x);                                                                                    \
+            s += x / y;                                                                                                \
+        }                                                                                                              \
+        return s;                                                                                                      \
+    }
+
+// FUNCTION: in_counts
+// HAS: /x . y/
+// HAS: /_counts\(/
+LOOP(counts)
+// FUNCTION: in_walks
+// HAS: /x . y/
+// HAS: /_walks\(/
+LOOP(walks)
+// FUNCTION: in_calls_it
+// HAS: /_calls_it\(/
+// HAS: /x . y/
+LOOP(calls_it)
+// FUNCTION: in_never_ends_at_top
+// HAS: /_never_ends_at_top\(/
+// HAS: /x . y/
+LOOP(never_ends_at_top)
+// FUNCTION: in_skips_the_end
+// HAS: /_skips_the_end\(/
+// HAS: /x . y/
+LOOP(skips_the_end)
+// FUNCTION: in_steps_now_and_then
+// HAS: /_steps_now_and_then\(/
+// HAS: /x . y/
+LOOP(steps_now_and_then)
+// FUNCTION: in_steps_back
+// HAS: /_steps_back\(/
+// HAS: /x . y/
+LOOP(steps_back)
+// FUNCTION: in_other_variable
+// HAS: /_other_variable\(/
+// HAS: /x . y/
+LOOP(other_variable)
+// FUNCTION: in_jumps_in
+// HAS: /_jumps_in\(/
+// HAS: /x . y/
+LOOP(jumps_in)
+// FUNCTION: in_is_even
+// HAS: /_is_even\(/
+// HAS: /x . y/
+LOOP(is_even)
+// FUNCTION: in_by_pointer
+// HAS: /_by_pointer\(/
+// HAS: /x . y/
+LOOP(by_pointer)
+// FUNCTION: in_waits
+// HAS: /_waits\(/
+// HAS: /x . y/
+LOOP(waits)
+// FUNCTION: in_prints
+// HAS: /_prints\(/
+// HAS: /x . y/
+LOOP(prints)
+// FUNCTION: in_stops
+// HAS: /_stops\(/
+// HAS: /x . y/
+LOOP(stops)
+
 int main(void) {
     put_i16(caller(3));
     put_i16(indirect(caller, 4));
     stop(4);
     put_i16(g);
+    pointer = counts;
+    a[3] = 5;
+    put_i16(in_counts(3, 7, 2) + in_walks(3, 7, 2) + in_by_pointer(3, 7, 2) + in_is_even(3, 7, 2) + in_waits(2, 7, 2));
+    put_i16(in_prints(2, 7, 3));
+    put_i16(in_calls_it(2, 7, zero)); // ends the program ahead of the quotient
     return 0;
 }

@@ -146,8 +146,7 @@ bool exact_types(const TYPE* a, const TYPE* b) {
     if (same_type(a, b)) return true;
     if (!a || !b) return false;
     TYPE_PAIRS pairs;
-    pairs.add(a, b);
-    return all_exact(pairs);
+    return nodes_exact(a, b, pairs) && all_exact(pairs);
 }
 
 bool equal_params(const fkPARAM* a, const fkPARAM* b) {
@@ -222,15 +221,13 @@ bool compatible_types(const TYPE* a, const TYPE* b, bool strict) {
     if (!a || !b) return a == b;
     if (!a->frozen || !b->frozen) return false;
     if (same_type(a, b)) return true;
-    TYPE_PAIRS pairs;
-    pairs.add(a, b);
-    while (!pairs.empty()) {
-        TYPE_PAIRS::PAIR p = pairs.take();
+    TYPE_PAIRS pairs; // takes no memory for types of one part
+    for (TYPE_PAIRS::PAIR p{a, b};; p = pairs.take()) {
         if (strict) p = {step_over(p.first), step_over(p.second)};
-        if (same_type(p.first, p.second)) continue;
-        if (!p.first->frozen || !p.second->frozen || !nodes_compatible(p.first, p.second, pairs)) return false;
+        const bool same = same_type(p.first, p.second);
+        if (!same && (!p.first->frozen || !p.second->frozen || !nodes_compatible(p.first, p.second, pairs))) return false;
+        if (pairs.empty()) return true;
     }
-    return true;
 }
 
 bool equiv_mtypes(TYPE* a, TYPE* b) { return exact_types(a->normalized_type()->stqs(), b->normalized_type()->stqs()); }

@@ -212,7 +212,8 @@ const FACT_FINDER marks("aliased objects", fact::alias_marks, fact::none, find_m
                         fact::pointees | fact::pointer_groups);
 const FACT_FINDER pointers(
     "what pointers point into", fact::pointees | fact::pointer_groups, fact::alias_marks,
-    [](FACTS wanted) { find_pointers(wanted, pointer_writes(currfuninfo)); }, [] { currfuninfo->spmap->clear(); });
+    [](FACTS wanted) { find_pointers(wanted, pointer_writes(currfuninfo)); }, [] { currfuninfo->spmap->clear(); },
+    nullptr, fact::pointees | fact::pointer_groups);
 
 } // namespace
 

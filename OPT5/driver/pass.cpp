@@ -26,7 +26,7 @@ void pass::run() {
     // A row without a frame changes blocks as it likes; an order of steps may have it between those that share a
     // hierarchy.
     if (currfuninfo && row.kind == ROW::FUNCTION && !row.frame) drop_hierarchy();
-    run_row(row, "step " + std::to_string(serial), skip);
+    run_row(row, {"step", static_cast<int>(serial)}, skip);
 }
 
 // ---- Orders

@@ -27,18 +27,18 @@ void print_current_function() {
     if (current_function_has_blocks() && fdebug) prbbinfix(fdebug);
 }
 
-void announce(const char* word, const ROW& row, const std::string& label) {
+void announce(const char* word, const ROW& row, const ROW_LABEL& label) {
     if (!print_debug) return;
-    debug_printf("\n\n\t\t\t---------- %s %s '%s' ----------\n", word, label.c_str(), row.name);
+    debug_printf("\n\n\t\t\t---------- %s %s '%s' ----------\n", word, label.text().c_str(), row.name);
     debug_flush();
 }
 
-void validate_current_function(const ROW& row, const std::string& label) {
+void validate_current_function(const ROW& row, const ROW_LABEL& label, const char* place = "") {
     if (!current_function_has_blocks()) return;
     const int errors =
         validate_cfg() + validate_stmts() + validate_grammar() + validate_facts() + validate_loop_hierarchy();
     if (errors == 0) return;
-    const std::string text = label + " '" + row.name + "' left " + std::to_string(errors) + " errors";
+    const std::string text = label.text() + place + " '" + row.name + "' left " + std::to_string(errors) + " errors";
     abort_optimizer(text.c_str());
 }
 
@@ -60,14 +60,14 @@ bool is_beyond_limit(const ROW& row) {
     return count > pass_debug_rows;
 }
 
-void do_work(const ROW& row, const std::string& label) {
+void do_work(const ROW& row, const ROW_LABEL& label) {
     if (!pass_debug_rows) begin_counted_rewrites(true);
     if (!has_work(row) || is_beyond_limit(row)) return;
     if (!row.frame || pass_debug_idle_frames || !row.frame->is_SSA_form) leave_kept_SSA_form();
     if (!row.frame || pass_debug_idle_frames) leave_kept_form();
     if (row.frame) {
         row.frame->begin();
-        if (pass_debug_validate) validate_current_function(row, label + " at the begin of");
+        if (pass_debug_validate) validate_current_function(row, label, " at the begin of");
     }
     if (row.kind != ROW::IDLE) {
         if (row.needs) need(row.needs);
@@ -79,7 +79,7 @@ void do_work(const ROW& row, const std::string& label) {
 
 } // namespace
 
-void run_row(const ROW& row, const std::string& label, bool skip) {
+void run_row(const ROW& row, const ROW_LABEL& label, bool skip) {
     if (skip || is_left_out(row)) {
         announce("SKIPPING", row, label);
         return;
@@ -103,7 +103,7 @@ void run_row(const ROW& row, const std::string& label, bool skip) {
 
 namespace {
 void run_rows(ROWS rows, const char* table) {
-    for (const ROW& row : rows) run_row(row, table, false);
+    for (const ROW& row : rows) run_row(row, {table}, false);
 }
 } // namespace
 

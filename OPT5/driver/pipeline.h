@@ -37,10 +37,16 @@ struct ROW {
     FACTS leaves; // still true behind it
 };
 
+// How the dump and messages name a row: "step 12", or by its table alone. The text is made where it is printed.
+struct ROW_LABEL {
+    const char* word;
+    int number = -1; // below 0: none
+    std::string text() const { return number < 0 ? word : std::string(word) + " " + std::to_string(number); }
+};
+
 // Runs a row of a function or a barrier: left out by switch, under its condition, in its frame, between its facts. The
-// function is dumped before and behind to the debug stream, and validated behind under `debug:validate`. `label` is how
-// the dump and messages name the row: "step 12" and the like.
-void run_row(const ROW& row, const std::string& label, bool skip);
+// function is dumped before and behind to the debug stream, and validated behind under `debug:validate`.
+void run_row(const ROW& row, const ROW_LABEL& label, bool skip);
 
 // The two tables beside the steps, for the current function.
 void run_rows_behind_reading();

@@ -17,6 +17,7 @@
 
 #include <algorithm>
 #include <ctime>
+#include <deque>
 #include <future>
 #include <list>
 #include <map>
@@ -27,7 +28,7 @@ register_option pass_debug_split_odb("debug:split_odb");
 
 namespace {
 
-using PASS_LIST = std::list<pass*>;
+using PASS_LIST = std::deque<pass*>;
 
 std::map<SYMTAB*, PASS_LIST> steps_table; // looked up, never walked: its order is that of pointers
 std::mutex queue_lock;                    // guards functions_queue
@@ -208,7 +209,8 @@ void finish_late_functions() {
         PASS_LIST& passes = steps_table[f];
         const bool will_be = std::find(passes.begin(), passes.end(), output_step) != passes.end();
         if (!will_be && !is_written(f)) passes.push_back(output_step);
-        passes.remove_if([](const pass* p) { return p->is_barrier(); });
+        passes.erase(std::remove_if(passes.begin(), passes.end(), [](const pass* p) { return p->is_barrier(); }),
+                     passes.end());
         run_until_barrier(f, passes);
     }
     unsuppressed_functions.clear();

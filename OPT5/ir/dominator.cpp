@@ -19,9 +19,11 @@ int intersect(int a, int b, const std::vector<int>& order, const std::vector<int
     return a;
 }
 
+using LISTS = Dominator::LISTS;
+
 // `sequence` lists the nodes in reverse postorder of the graph whose predecessors are `preds`, the root first.
-void iterate(const std::vector<int>& sequence, const std::vector<std::vector<int>>& preds, std::vector<int>& idom) {
-    std::vector<int> order(preds.size(), 0);
+void iterate(const std::vector<int>& sequence, const LISTS& preds, std::vector<int>& idom) {
+    std::vector<int> order(idom.size(), 0);
     for (size_t i = 0; i < sequence.size(); ++i) order[static_cast<size_t>(sequence[i])] = static_cast<int>(i);
     const int root = sequence.front();
     idom[root] = root;
@@ -30,7 +32,7 @@ void iterate(const std::vector<int>& sequence, const std::vector<std::vector<int
         for (size_t i = 1; i < sequence.size(); ++i) {
             const int b = sequence[i];
             int dom = Dominator::UNDEFINED;
-            for (int p : preds[b])
+            for (const int p : preds.of(b))
                 if (idom[p] != Dominator::UNDEFINED)
                     dom = dom == Dominator::UNDEFINED ? p : intersect(p, dom, order, idom);
             if (dom == idom[b]) continue;
@@ -40,23 +42,42 @@ void iterate(const std::vector<int>& sequence, const std::vector<std::vector<int
     }
 }
 
-std::vector<int> reverse_postorder(int root, const std::vector<std::vector<int>>& succs) {
+// A walk over a graph or tree, and how far it has come in the list of each node on its path.
+class PATH {
+public:
+    PATH(int root, const LISTS& lists) : lists(lists) { enter(root); }
+    bool is_empty() const { return nodes.empty(); }
+    int last() const { return nodes.back().node; }
+    void enter(int node) {
+        const LISTS::RANGE list = lists.of(node);
+        nodes.push_back({node, list.begin(), list.end()});
+    }
+    void leave() { nodes.pop_back(); }
+    const int* next() { return nodes.back().at == nodes.back().end ? nullptr : nodes.back().at++; } // null behind the last
+
+private:
+    struct PLACE {
+        int node;
+        const int *at, *end;
+    };
+    const LISTS& lists;
+    std::vector<PLACE> nodes;
+};
+
+std::vector<int> reverse_postorder(int root, const LISTS& succs, size_t count) {
     std::vector<int> out;
-    std::vector<bool> seen(succs.size(), false);
-    std::vector<std::pair<int, size_t>> stack{{root, 0}};
+    out.reserve(count);
+    std::vector<bool> seen(count, false);
     seen[static_cast<size_t>(root)] = true;
-    while (!stack.empty()) {
-        auto& [b, next] = stack.back();
-        const auto& list = succs[static_cast<size_t>(b)];
-        if (next == list.size()) {
-            out.push_back(b);
-            stack.pop_back();
-            continue;
+    for (PATH path(root, succs); !path.is_empty();) {
+        const int* s = path.next();
+        if (!s) {
+            out.push_back(path.last());
+            path.leave();
+        } else if (!seen[static_cast<size_t>(*s)]) {
+            seen[static_cast<size_t>(*s)] = true;
+            path.enter(*s);
         }
-        const int s = list[next++];
-        if (seen[static_cast<size_t>(s)]) continue;
-        seen[static_cast<size_t>(s)] = true;
-        stack.emplace_back(s, 0);
     }
     std::reverse(out.begin(), out.end());
     return out;
@@ -64,10 +85,19 @@ std::vector<int> reverse_postorder(int root, const std::vector<std::vector<int>>
 
 } // namespace
 
+template <class F>
+void LISTS::build(size_t count, const F& for_each_pair) {
+    // Counted one place late, so that the places where the lists begin move on to where they end while they are filled.
+    first.assign(count + 2, 0);
+    for_each_pair([this](int node, int) { ++first[static_cast<size_t>(node) + 2]; });
+    for (size_t i = 2; i < first.size(); ++i) first[i] += first[i - 1];
+    all.resize(static_cast<size_t>(first.back()));
+    for_each_pair([this](int node, int member) { all[static_cast<size_t>(first[static_cast<size_t>(node) + 1]++)] = member; });
+}
+
 // Post-dominators start from a node of their own, numbered 0, behind every block that control leaves the function from.
 // So a function with several returns has one root; a block whose chain ends there has no post-dominator.
 void Dominator::builder() {
-    renumber_bblocks();
     FUNINFO* f = currfuninfo;
     const size_t n = static_cast<size_t>(f->bb_count) + 1;
     saved_bb_count = f->bb_count;
@@ -77,22 +107,24 @@ void Dominator::builder() {
     exit_dfn = f->exit_bb ? f->exit_bb->dfn : 0;
     if (!f->bb_count) return;
 
-    std::vector<std::vector<int>> succs(n), preds(n);
-    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
-        const auto b = static_cast<size_t>(bb->dfn);
-        by_dfn[b] = bb;
-        for (const EDGE* e = bb->successors; e; e = e->rest) succs[b].push_back(e->first->dfn);
-        for (const EDGE* e = bb->predecessors; e; e = e->rest) preds[b].push_back(e->first->dfn);
-        if (!bb->successors) {
-            succs[b].push_back(0);
-            preds[0].push_back(bb->dfn);
+    for (BBLK* bb = f->bb_list; bb; bb = bb->dflink) by_dfn[static_cast<size_t>(bb->dfn)] = bb;
+    LISTS succs, preds;
+    succs.build(n, [&](const auto& enter) {
+        for (const BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
+            for (const EDGE* e = bb->successors; e; e = e->rest) enter(bb->dfn, e->first->dfn);
+            if (!bb->successors) enter(bb->dfn, 0);
         }
-    }
-    const int entry = f->bb_list->dfn;
-    std::vector<int> forward = reverse_postorder(entry, succs);
+    });
+    preds.build(n, [&](const auto& enter) {
+        for (const BBLK* bb = f->bb_list; bb; bb = bb->dflink) {
+            for (const EDGE* e = bb->predecessors; e; e = e->rest) enter(bb->dfn, e->first->dfn);
+            if (!bb->successors) enter(0, bb->dfn);
+        }
+    });
+    std::vector<int> forward = reverse_postorder(f->bb_list->dfn, succs, n);
     forward.erase(std::remove(forward.begin(), forward.end(), 0), forward.end());
     iterate(forward, preds, idom);
-    iterate(reverse_postorder(0, preds), succs, ipostdom);
+    iterate(reverse_postorder(0, preds, n), succs, ipostdom);
     for (int b = 1; b <= f->bb_count; ++b) {
         if (idom[b] == UNDEFINED) debug_printf("**** >>>> WARNING: BB%d doesn't have a dominator\n", b);
         if (ipostdom[b] == UNDEFINED) debug_printf("**** >>>> WARNING: BB%d doesn't have a postdominator\n", b);
@@ -102,12 +134,14 @@ void Dominator::builder() {
 
 void Dominator::generate_tree_walk() {
     below = post_below = INTERVALS();
-    children.assign(idom.size(), {});
-    post_children.assign(idom.size(), {});
-    for (int b = 1; b <= saved_bb_count; ++b) {
-        if (idom[b] != UNDEFINED && idom[b] != b) children[idom[b]].push_back(b);
-        if (ipostdom[b] != UNDEFINED) post_children[ipostdom[b]].push_back(b);
-    }
+    children.build(idom.size(), [this](const auto& enter) {
+        for (int b = 1; b <= saved_bb_count; ++b)
+            if (idom[b] != UNDEFINED && idom[b] != b) enter(idom[b], b);
+    });
+    post_children.build(idom.size(), [this](const auto& enter) {
+        for (int b = 1; b <= saved_bb_count; ++b)
+            if (ipostdom[b] != UNDEFINED) enter(ipostdom[b], b);
+    });
 }
 
 void Dominator::rebuild() { builder(); }
@@ -143,23 +177,19 @@ BBLK* Dominator::immediate_post_dominator(const BBLK* bb) {
     return immediate_post_dominator(bb->dfn);
 }
 
-void Dominator::INTERVALS::number(int root, const std::vector<std::vector<int>>& tree) {
-    first.assign(tree.size(), 0);
-    last.assign(tree.size(), 0);
+void Dominator::INTERVALS::number(int root, const LISTS& tree, size_t count) {
+    first.assign(count, 0);
+    last.assign(count, 0);
     int n = 0;
-    std::vector<std::pair<int, size_t>> stack{{root, 0}};
     first[static_cast<size_t>(root)] = ++n;
-    while (!stack.empty()) {
-        auto& [node, next] = stack.back();
-        const auto& list = tree[static_cast<size_t>(node)];
-        if (next == list.size()) {
-            last[static_cast<size_t>(node)] = n;
-            stack.pop_back();
-            continue;
+    for (PATH path(root, tree); !path.is_empty();) {
+        if (const int* child = path.next()) {
+            first[static_cast<size_t>(*child)] = ++n;
+            path.enter(*child);
+        } else {
+            last[static_cast<size_t>(path.last())] = n;
+            path.leave();
         }
-        const int child = list[next++];
-        first[static_cast<size_t>(child)] = ++n;
-        stack.emplace_back(child, 0);
     }
 }
 
@@ -171,7 +201,7 @@ bool Dominator::INTERVALS::covers(int a, int b) const {
 bool Dominator::dominates(int a, int b) {
     refresh();
     if (a < 1 || b < 1 || a > saved_bb_count || b > saved_bb_count) return false;
-    if (below.first.empty()) below.number(1, children);
+    if (below.first.empty()) below.number(1, children, idom.size());
     return a == b || below.covers(a, b);
 }
 bool Dominator::dominates(const BBLK* a, const BBLK* b) {
@@ -182,7 +212,7 @@ bool Dominator::dominates(const BBLK* a, const BBLK* b) {
 bool Dominator::post_dominates(int a, int b) {
     refresh();
     if (a < 1 || b < 1 || a > saved_bb_count || b > saved_bb_count) return false;
-    if (post_below.first.empty()) post_below.number(0, post_children);
+    if (post_below.first.empty()) post_below.number(0, post_children, idom.size());
     return a == b || post_below.covers(a, b);
 }
 bool Dominator::post_dominates(const BBLK* a, const BBLK* b) {
@@ -190,15 +220,15 @@ bool Dominator::post_dominates(const BBLK* a, const BBLK* b) {
     return post_dominates(a->dfn, b->dfn);
 }
 
-const std::vector<int>& Dominator::dominator_children(int dfn) {
+std::vector<int> Dominator::dominator_children(int dfn) {
     DFSblock(dfn);
-    return children[static_cast<size_t>(dfn)];
+    return {children.of(dfn).begin(), children.of(dfn).end()};
 }
 
-const std::vector<int>& Dominator::post_dominator_children(int dfn) {
+std::vector<int> Dominator::post_dominator_children(int dfn) {
     refresh();
     OPT_ASSERT(dfn >= 0 && dfn <= saved_bb_count);
-    return post_children[static_cast<size_t>(dfn)];
+    return {post_children.of(dfn).begin(), post_children.of(dfn).end()};
 }
 
 namespace {
@@ -206,22 +236,20 @@ namespace {
 using VISIT = std::function<void(BBLK*)>;
 
 // `root` itself is visited if it names a block.
-void df_traverse(int root, const std::vector<std::vector<int>>& tree, const std::vector<BBLK*>& by_dfn, const VISIT& descend,
-                 const VISIT& ascend) {
-    std::vector<std::pair<int, size_t>> stack{{root, 0}};
-    if (by_dfn[static_cast<size_t>(root)] && descend) descend(by_dfn[static_cast<size_t>(root)]);
-    while (!stack.empty()) {
-        auto& [b, next] = stack.back();
-        const auto& list = tree[static_cast<size_t>(b)];
-        BBLK* bb = by_dfn[static_cast<size_t>(b)];
-        if (next == list.size()) {
-            stack.pop_back();
-            if (bb && ascend) ascend(bb);
-            continue;
+void df_traverse(int root, const LISTS& tree, const std::vector<BBLK*>& by_dfn, const VISIT& descend, const VISIT& ascend) {
+    auto visit = [&](const VISIT& work, int node) {
+        if (by_dfn[static_cast<size_t>(node)] && work) work(by_dfn[static_cast<size_t>(node)]);
+    };
+    visit(descend, root);
+    for (PATH path(root, tree); !path.is_empty();) {
+        if (const int* child = path.next()) {
+            visit(descend, *child);
+            path.enter(*child);
+        } else {
+            const int node = path.last();
+            path.leave();
+            visit(ascend, node);
         }
-        const int child = list[next++];
-        if (descend) descend(by_dfn[static_cast<size_t>(child)]);
-        stack.emplace_back(child, 0);
     }
 }
 

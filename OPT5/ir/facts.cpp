@@ -17,13 +17,11 @@ void for_each_fact(FACTS facts, F&& visit) {
         if (facts >> i & 1) visit(FACTS(1) << i, finders[i]);
 }
 
+// A fact rests on facts of lower bits alone, so that one walk over the bits takes each behind what it rests on.
 FACTS with_what_rests_on(FACTS gone) {
-    for (FACTS before = fact::none; before != gone;) {
-        before = gone;
-        for_each_fact(fact::every, [&](FACTS one, const FACT_FINDER* finder) {
-            if (finder && finder->rests_on & gone) gone |= one;
-        });
-    }
+    for_each_fact(fact::every, [&](FACTS one, const FACT_FINDER* finder) {
+        if (finder && finder->rests_on & gone) gone |= one;
+    });
     return gone;
 }
 
@@ -36,7 +34,6 @@ FACT_FINDER::FACT_FINDER(const char* name, FACTS fact, FACTS rests_on, void (*fi
         if (fact >> i & 1) finders[i] = this;
 }
 
-// A fact rests on facts of lower bits alone, so that one walk over the bits takes each behind what it rests on.
 void need(FACTS wanted) {
     FUNINFO* f = currfuninfo;
     if (!(wanted & ~f->facts)) return;

@@ -166,10 +166,10 @@ const NODE* copied_parameter(const NODE* t) {
 
 bool copies_parameter(const NODE* t, SYMTAB** local, SYMTAB** parm) {
     if (t->op != ASG && t->op != STASG) return false;
+    const NODE* from = copied_parameter(t->right); // first: an operator there settles it for most assignments
+    if (!from) return false;
     const NODE* to = below_SSA(t->left);
-    if (!to || to->op != NAME || !to->u.sym || to->u.sym->level != 2) return false;
-    const NODE* from = copied_parameter(t->right);
-    if (!from || strcmp(to->u.sym->name, from->u.sym->name)) return false;
+    if (!to || to->op != NAME || !to->u.sym || to->u.sym->level != 2 || strcmp(to->u.sym->name, from->u.sym->name)) return false;
     *local = to->u.sym;
     *parm = from->u.sym;
     return true;

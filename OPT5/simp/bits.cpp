@@ -230,7 +230,7 @@ NODE* simp_unary(NODE* t, struct LOOP* loop) {
 }
 
 NODE* simp_by_known_bits(NODE* t) {
-    if (!is_integer(t->type) || is_icon(t)) return t;
+    if (!is_integer(t->type) || is_icon(t) || lowest_bit_is_unknown(t)) return t;
     const KNOWN_BITS k = known_bits(t);
     if ((k.zeros | k.ones) != mask_of(t->type)) return t;
     return constant_for(t, truncate_to_type(INT65(0, k.ones), t->type));

@@ -186,6 +186,27 @@ KNOWN_BITS known(const NODE* t, int levels) {
     return levels > 0 ? computed(t, levels - 1) : KNOWN_BITS{};
 }
 
+// Of sums and complements the lowest bit depends on the lowest bits of the operands alone, and a conversion keeps it.
+bool lowest_is_unknown(const NODE* t, int levels) {
+    for (;; t = t->left, --levels) {
+        if (!is_integer(t->type)) return true;
+        if (t->op == ICON || t->type->is_bool()) return false;
+        if (t->op == NAME) return !zeros_of_variables;
+        if (levels <= 0) return true;
+        switch (t->op) {
+        case PLUS:
+        case MINUS:
+        case XORB:
+            if (lowest_is_unknown(t->right, levels - 1)) return true;
+            break;
+        case UMINUS:
+        case NOTB:
+        case SCONV: break;
+        default: return t->op == UMULT;
+        }
+    }
+}
+
 } // namespace
 
 const std::unordered_map<const SYMTAB*, uint64_t>* zeros_of_variables = nullptr;
@@ -193,6 +214,8 @@ const std::unordered_map<const SYMTAB*, uint64_t>* zeros_of_variables = nullptr;
 uint64_t known_zeros_as(const NODE* tree, const TYPE* type) {
     return is_integer(type) ? operand(tree, type, MOST_LEVELS).zeros : 0;
 }
+
+bool lowest_bit_is_unknown(const NODE* tree) { return lowest_is_unknown(tree, MOST_LEVELS); }
 
 KNOWN_BITS known_bits(const NODE* tree) { return known(tree, MOST_LEVELS); }
 

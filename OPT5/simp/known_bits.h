@@ -16,6 +16,8 @@ struct KNOWN_BITS {
 // Of an integer or enumeration tree of at most 64 bits; nothing is known of another. Looks a fixed number of levels
 // deep, so that asking at every node of a tree stays linear.
 KNOWN_BITS known_bits(const NODE* tree);
+// Tells of most values that are no constant, without looking at all bits: false where the lowest one may be known.
+bool lowest_bit_is_unknown(const NODE* tree);
 
 // The bits of variables that are zero in each value they hold, as whoever set this found; null at other times.
 extern const std::unordered_map<const SYMTAB*, uint64_t>* zeros_of_variables; // looked up only

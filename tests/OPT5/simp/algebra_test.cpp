@@ -25,6 +25,28 @@ TEST_F(Algebra, RangesGiveTheirCommonBits) {
     EXPECT_EQ(find_known_ones_in_range(INT65(8), INT65(11)), INT65(8));
 }
 
+// The short answer never says that a bit is unknown which the long one knows.
+TEST_F(Algebra, TheLowestBitIsUnknownToTheLongAnswerToo) {
+    SYMTAB* xs = symbol("x", tp->int_t);
+    std::vector<NODE*> trees{icon(1), icon(-2), name(xs), un(SCONV, icon(3), tp->long_t), bin(LT, name(xs), icon(4))};
+    const size_t leaves = trees.size();
+    for (size_t first = 0, behind = leaves; trees.size() < 2000; first = behind, behind = trees.size())
+        for (size_t i = first; i < behind; ++i) {
+            for (const int op : {UMINUS, NOTB}) trees.push_back(un(op, trees[i]));
+            for (TYPE* to : {tp->uchar_t, tp->long_t, tp->bool_t}) trees.push_back(un(SCONV, trees[i], to));
+            for (const int op : {PLUS, MINUS, XORB, ANDB, MULT, SLL})
+                for (size_t k = 0; k < leaves; ++k) trees.push_back(bin(op, trees[i], trees[k], trees[i]->type));
+        }
+    int unknown = 0;
+    for (const NODE* t : trees) {
+        if (!lowest_bit_is_unknown(t)) continue;
+        ++unknown;
+        const KNOWN_BITS k = known_bits(t);
+        ASSERT_FALSE((k.zeros | k.ones) & 1);
+    }
+    EXPECT_GT(unknown, 100);
+}
+
 // ---- A known value in place of a tree
 
 TEST_F(Algebra, KnownValuesReplaceTrees) {

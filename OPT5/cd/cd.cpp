@@ -3,6 +3,4 @@
 
 void do_cd_vectorization() {}
 void do_cd_ilp() {}
-void cd_unroll_loops_by_request() {}
-void cd_unroll_loops_for_speed(bool) {}
 void fuse_loops_at_loop_level(struct LOOP*) {}

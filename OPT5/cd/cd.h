@@ -5,7 +5,11 @@ struct LOOP; // written out where it is used: an opcode has the same name
 
 void do_cd_vectorization();
 void do_cd_ilp();
-void cd_unroll_loops_by_request();
-void cd_unroll_loops_for_speed(bool completely);
+
+// Unrolling, of innermost loops (unroll.cpp). Whether a loop was unrolled: the hierarchy is stale then.
+bool cd_unroll_loops_by_request(); // of pragmas
+bool cd_unroll_inner_loops_completely();
+bool cd_condx_unroll_loop_completely(struct LOOP* loop, bool told); // if that pays, or a pragma asks for it
+bool cd_unroll_loops_for_speed(bool completely); // by trial; `completely`: or not at all
 
 void fuse_loops_at_loop_level(struct LOOP* loop);

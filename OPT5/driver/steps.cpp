@@ -53,6 +53,7 @@ bool L2_and_SIMD() { return L2() && currfuninfo->simd_allowed; }
 // What such a row does is for loops alone: a function without needs not be brought into the form of its frame.
 bool L2_with_loops() { return L2() && has_loops(); }
 bool L2_without_loops() { return L2() && !has_loops(); }
+bool L2_with_loops_to_unroll() { return L2_with_loops() && size_speed_goal() >= 3; }
 bool L2_with_loops_for_speed() { return L2_with_loops() && size_speed_goal() >= 4; }
 // A unified memory is on both buses at once.
 bool L2_with_loops_on_dual_hardware() { return L2_with_loops() && cpu_version == 28 && rtc_unified_memory; }
@@ -185,6 +186,20 @@ void sink_definitions() {
     if (sink_unused_definitions(root())) drop_hierarchy();
 }
 
+void unroll_by_request() {
+    if (cd_unroll_loops_by_request()) drop_hierarchy();
+}
+
+void unroll_completely() {
+    bool any = cd_unroll_inner_loops_completely();
+    any |= cd_unroll_loops_for_speed(true);
+    if (any) drop_hierarchy();
+}
+
+void unroll_for_speed() {
+    if (cd_unroll_loops_for_speed(false)) drop_hierarchy();
+}
+
 // Dependence analysis is active for as long as there is a hierarchy to collapse.
 void collapse_loops() {
     if (!root()) return;
@@ -275,15 +290,15 @@ const ROW steps[] = {
     /* 38 */ {L, "collapse_loops", &D, L2, [] { with_hierarchy(collapse_loops); }, none, none},
     /* 39 */ {L, "circular_addressing", &D, L2, circular_addressing, none, none},
     /* 40 */ {L, "loop_if_interchange", &D_with_dependence, L2, loop_if_interchange, none, none},
-    /* 41 */ {L, "cd_unroll_by_request", &D, L2, cd_unroll_loops_by_request, none, none},
+    /* 41 */ {F, "cd_unroll_by_request", &D, L2_with_loops, [] { with_hierarchy(unroll_by_request); }, none, graph | alias_marks},
     /* 42 */ {F, "DMAC_conversion", &D, L2_with_loops_on_dual_hardware, [] { with_hierarchy(DMAC_conversion); }, none, graph | alias_marks},
-    /* 43 */ {L, "cd_unroll_completely_for_speed", &D, L2, [] { cd_unroll_loops_for_speed(true); }, none, none},
+    /* 43 */ {F, "cd_unroll_completely_for_speed", &D, L2_with_loops, [] { with_hierarchy(unroll_completely); }, none, graph | alias_marks},
     /* 44 */ {L, "unroll_completely_for_SP", nullptr, always, nothing, none, none},
     /* 45 */ {L, "unroll_and_jam", &D_with_dependence, L2, [] { unroll_and_jam_loop_nest(root(), true, true); }, none, none},
     /* 46 */ {L, "loop fusion", &D_with_dependence, fusion_is_enabled, [] { fuse_loops_at_loop_level(root()); }, none, none},
     /* 47 */ {L, "runtime_alias_predication", nullptr, always, nothing, none, none},
     /* 48 */ {L, "peel_and_unroll", nullptr, always, nothing, none, none},
-    /* 49 */ {L, "cd_unroll_for_speed", &D, L2, [] { cd_unroll_loops_for_speed(false); }, none, none},
+    /* 49 */ {F, "cd_unroll_for_speed", &D, L2_with_loops_to_unroll, [] { with_hierarchy(unroll_for_speed); }, none, graph | alias_marks},
     /* 50 */ {L, "PT_info", &D, L2, [] { with_hierarchy(propagate_PT_info); }, none, none},
     /* 51 */ {L, "explode_arrays", nullptr, L2, explode_local_arrays, none, none},
     /* 52 */ {L, "unroll_for_SP", &D_with_dependence, L2, [] { unroll_loops_for_SP(root()); }, none, none},

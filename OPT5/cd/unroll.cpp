@@ -1,0 +1,253 @@
+// Loops are unrolled: by request of the source, completely where they are short, and as far as that pays.
+//
+//     for (i = 0; i < 32; i++) a[i] = i;        for (i = 0; i < 32; i += 4) { a[i] = i; a[i+1] = i+1; ... }
+//
+// Needs: the loop hierarchy with its counts, trees in normal form. Leaves: blocks numbered, no hierarchy where a loop was
+// unrolled: it is made anew.
+// Sound because of what `UNROLLED_BODY` says, and because a test goes only where the count is proved, or promised, to be a
+// multiple of the factor, or what is left over runs behind the copies. What was promised of the loop is divided.
+#include "OPT5/cd/cd.h"
+
+#include "OPT5/cd/unroll_info.h"
+#include "OPT5/dd/loop.h"
+#include "OPT5/ir/facts.h"
+#include "OPT5/ir/funinfo.h"
+#include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
+#include "OPT5/ir/rewrite_limit.h"
+#include "OPT5/ir/symtab.h"
+#include "OPT5/ir/trees.h"
+
+#include <algorithm>
+#include <vector>
+
+namespace {
+
+constexpr int MOST_CONDX_COPIES = 63;
+constexpr uint64_t MOST_REQUESTED_SPACE = 4000;
+
+bool is_icon(const NODE* t) { return t && t->op == ICON; }
+
+// ---- What the programmer is told
+
+PSN place_of(const struct LOOP* loop) {
+    const SOURCE_PLACE& start = loop->sourceStart;
+    PSN place{nullptr, 0, 0};
+    for (const LIST* s = loop->head->statements; s && place.line == 0; s = s->rest)
+        if (s->psn) place = *s->psn;
+    if (start.line) place = {start.file.empty() ? place.file : start.file.c_str(), start.line, start.column};
+    return place;
+}
+
+std::string text_of_loop(const struct LOOP* loop, bool completely, int factor) {
+    const std::string by = std::string(completely ? " completely" : "") + " by factor " + std::to_string(factor) + ".\n";
+    if (const NODE* p = loop->sourceLoopPragma)
+        return "Unrolling '" + get_PPRAGMA_tree_arg(p, 3) + "' loop on '" + get_PPRAGMA_tree_arg(p, 1) + "' at lines " +
+               get_PPRAGMA_tree_arg(p, 0) + "-" + get_PPRAGMA_tree_arg(p, 2) + by;
+    if (const PSN place = place_of(loop); place.line) return "Unrolling loop at line " + std::to_string(place.line) + by;
+    return "Unrolling loop #" + std::to_string(loop->uid) + by;
+}
+
+void tell(const char* format, const std::string& text) {
+    if (print_debug) debug_printf(format, text.c_str());
+    if (write_opt_info && finfo) info_printf(format, text.c_str());
+}
+
+void report_estimated_speedup(const LOOP_UNROLLING_INFO& info) {
+    char text[160];
+    const double uf = info.unrolledFactor;
+    const uint64_t space = info.unrolledSpaceCost + info.peeledIterationSpaceCost;
+    std::snprintf(text, sizeof text, "Estimated speedup: %.2fx, code size increase: %.2fx (%lu:->%lu)\n",
+                  static_cast<double>(info.originalTimeCost) * uf / static_cast<double>(std::max<uint64_t>(info.unrolledTimeCost, 1)),
+                  static_cast<double>(space) / static_cast<double>(std::max<uint64_t>(info.originalSpaceCost, 1)),
+                  static_cast<unsigned long>(info.originalSpaceCost), static_cast<unsigned long>(space));
+    tell("%s", text);
+}
+
+void report_total_unrolling_factor(const LOOP_UNROLLING_INFO& info) {
+    if (info.loop->unrollAmount > 1)
+        tell("Total unrolling factor for this loop: %sx\n", std::to_string(info.loop->unrollAmount * info.unrolledFactor));
+}
+
+void report_for_unroll_for_speed(const LOOP_UNROLLING_INFO& info) {
+    const int factor = static_cast<int>(info.unrolledFactor);
+    tell("%s", text_of_loop(info.loop, info.unrolledCompletely, factor));
+    report_estimated_speedup(info);
+    report_total_unrolling_factor(info);
+    if (print_debug && fdebug) info.print("unrolled", fdebug);
+    if (!remarks_are_wanted) return;
+    const PSN place = place_of(info.loop);
+    std::string text = info.unrolledCompletely ? "its " + std::to_string(factor) + " iterations stand one behind the other"
+                                               : std::to_string(factor) + " iterations in one";
+    if (info.peeledIterationCount) text += ", what is left over behind them";
+    remark("unroll", &place, REMARK::DONE, text);
+}
+
+void refuse(const struct LOOP* loop, const std::string& why) {
+    if (!remarks_are_wanted) return;
+    const PSN place = place_of(loop);
+    remark("unroll", &place, REMARK::MISSED, "not unrolled as the pragma asks: " + why);
+}
+
+// ---- One loop
+
+// The pragma's factor, 0 without one.
+int64_t requested_factor(const struct LOOP* loop) {
+    if (!loop->unrollPragma) return 0;
+    INT65 r = get_PPRAGMA_tree_int_arg(loop->unrollPragma, 0);
+    if (is_icon(loop->maxTrips)) r = std::min(r, loop->maxTrips->u.lval, [](INT65 a, INT65 b) { return a < b; });
+    return r > INT65(0) && r.fits<int32_t>() ? r.fits_in<int32_t>() : 0;
+}
+
+bool may_be_looked_at(const struct LOOP* loop) {
+    return !loop->is_root() && !loop->contents.empty() && loop->preheader && !loop_has_subloops(loop);
+}
+
+// The records of what the loop counted are of the copies, or of none.
+void unroll(LOOP_UNROLLING_INFO& info, bool peeled, UNROLLED_BODY& body) {
+    struct LOOP* loop = info.loop;
+    const int factor = static_cast<int>(info.unrolledFactor);
+    report_for_unroll_for_speed(info);
+    if (info.unrolledCompletely) {
+        body.unroll_completely(factor);
+        delete_pragmas_for_loop(loop);
+        return;
+    }
+    if (!peeled)
+        body.unroll(factor);
+    else {
+        body.unroll(factor, info.rest());
+        // The factor of the count is none of that of the copies.
+        const INT65 u(factor);
+        if (is_icon(loop->tripFactor) && !(loop->tripFactor->u.lval % u).is_zero()) {
+            erase_tree(loop->tripFactor);
+            loop->tripFactor = nullptr;
+        }
+    }
+    update_pragmas_for_loop(loop, factor);
+}
+
+} // namespace
+
+// ---- Completely
+
+bool cd_condx_unroll_loop_completely(struct LOOP* loop, bool told) {
+    const int64_t requested = requested_factor(loop);
+    if (!may_be_looked_at(loop) || loop->has(LOOP_early_exit) || !loop_is_OK_for_unrolling(loop, requested > 0, nullptr)) return false;
+    LOOP_UNROLLING_INFO info(loop);
+    info.characterize_loop_before_unrolling();
+    const INT65 n = info.maximumTripCount;
+    if (n < INT65(2) || n > INT65(MOST_CONDX_COPIES) || info.minimumTripCount != n) return false;
+    if (requested > 0 && INT65(requested) < n) return false;
+    const int goal = size_speed_goal();
+    if (requested == 0) {
+        if (goal < 1 || (goal < 2 && n >= INT65(3)) || (goal < 3 && n >= INT65(5)) || loop->unrollAmount > 1) return false;
+    }
+    UNROLLED_BODY body(loop);
+    info.characterize_body(body);
+    info.unrolledCompletely = true;
+    info.characterize_unrolled_loop(n.fits_in<int32_t>(), static_cast<int>(requested), false);
+    if (!info.unrolling_completely_wins(told) || !rewrite_is_allowed(loop->tail->branch())) return false;
+    unroll(info, false, body);
+    return true;
+}
+
+namespace {
+
+std::vector<struct LOOP*> innermost_loops() {
+    std::vector<struct LOOP*> loops;
+    if (struct LOOP* root = loop_root())
+        for (struct LOOP* loop : loops_inner_first(root))
+            if (may_be_looked_at(loop)) loops.push_back(loop);
+    return loops;
+}
+
+bool has_work() {
+    return loop_root() && opt_level() >= 2 && !currfuninfo->saves_environment && !currfuninfo->bb_list->is_in_LIR_form();
+}
+
+// New symbols get their places, and blocks their numbers.
+bool finish(bool any) {
+    if (!any) return false;
+    sym_split(currfuninfo);
+    renumber_bblocks();
+    changed(fact::none);
+    return true;
+}
+
+} // namespace
+
+bool cd_unroll_inner_loops_completely() {
+    if (print_debug) debug_printf("\n\t\t ----- ENTERING cd_unroll_inner_loops_completely() -----\n");
+    bool any = false;
+    if (!has_work()) return false;
+    for (struct LOOP* loop : innermost_loops()) any |= cd_condx_unroll_loop_completely(loop, true);
+    return finish(any);
+}
+
+// ---- By request
+
+namespace {
+
+bool unroll_by_request(struct LOOP* loop, int factor) {
+    std::string why;
+    if (!loop_is_OK_for_unrolling(loop, true, &why)) {
+        refuse(loop, why);
+        return false;
+    }
+    if (cd_condx_unroll_loop_completely(loop, false)) return true;
+    UNROLLED_BODY body(loop);
+    LOOP_UNROLLING_INFO info(loop);
+    info.characterize_body(body);
+    info.unrolledFactor = info.userRequestedUF = static_cast<uint32_t>(factor);
+    info.characterize_loop_test_intervals();
+    const bool peeled = info.peel_excess_loop_iterationsp();
+    info.characterize_unrolled_loop(factor, factor, peeled);
+    if (!info.has_one_test()) {
+        refuse(loop, "its number of iterations is not known ahead of it");
+        return false;
+    }
+    if (info.unrolledSpaceCost + info.peeledIterationSpaceCost > MOST_REQUESTED_SPACE) {
+        refuse(loop, "it is too large for so many copies");
+        return false;
+    }
+    if (!rewrite_is_allowed(loop->tail->branch())) return false;
+    unroll(info, peeled, body);
+    return true;
+}
+
+} // namespace
+
+bool cd_unroll_loops_by_request() {
+    if (print_debug) debug_printf("\n\n\t\t\t------- ENTERING 'cd_unroll_loops_by_request' ------\n");
+    if (!has_work()) return false;
+    bool any = false;
+    for (struct LOOP* loop : innermost_loops())
+        if (const int64_t factor = requested_factor(loop); factor > 1) any |= unroll_by_request(loop, static_cast<int>(factor));
+    return finish(any);
+}
+
+// ---- For speed
+
+namespace {
+
+bool unroll_for_speed(struct LOOP* loop, bool completely) {
+    if (requested_factor(loop) != 0 || !loop_is_OK_for_unrolling(loop, false, nullptr)) return false;
+    UNROLLED_BODY body(loop);
+    LOOP_UNROLLING_INFO info(loop);
+    info.characterize_body(body);
+    info.characterize_loop_before_unrolling();
+    const bool peeled = info.select_unrolling_factor(completely);
+    if (info.unrolledFactor < 2 || !rewrite_is_allowed(loop->tail->branch())) return false;
+    unroll(info, peeled, body);
+    return true;
+}
+
+} // namespace
+
+bool cd_unroll_loops_for_speed(bool completely) {
+    if (!has_work() || size_speed_goal() < 3) return false;
+    bool any = false;
+    for (struct LOOP* loop : innermost_loops()) any |= unroll_for_speed(loop, completely);
+    return finish(any);
+}

@@ -39,18 +39,17 @@ PSN place_of(const struct LOOP* loop) {
     return place;
 }
 
-std::string text_of_loop(const struct LOOP* loop, bool completely, int factor) {
-    const std::string by = std::string(completely ? " completely" : "") + " by factor " + std::to_string(factor) + ".\n";
+std::string text_of_loop(const struct LOOP* loop) {
     if (const NODE* p = loop->sourceLoopPragma)
-        return "Unrolling '" + get_PPRAGMA_tree_arg(p, 3) + "' loop on '" + get_PPRAGMA_tree_arg(p, 1) + "' at lines " +
-               get_PPRAGMA_tree_arg(p, 0) + "-" + get_PPRAGMA_tree_arg(p, 2) + by;
-    if (const PSN place = place_of(loop); place.line) return "Unrolling loop at line " + std::to_string(place.line) + by;
-    return "Unrolling loop #" + std::to_string(loop->uid) + by;
+        return "'" + get_PPRAGMA_tree_arg(p, 3) + "' loop on '" + get_PPRAGMA_tree_arg(p, 1) + "' at lines " +
+               get_PPRAGMA_tree_arg(p, 0) + "-" + get_PPRAGMA_tree_arg(p, 2);
+    if (const PSN place = place_of(loop); place.line) return "loop at line " + std::to_string(place.line);
+    return "loop #" + std::to_string(loop->uid);
 }
 
-void tell(const char* format, const std::string& text) {
-    if (print_debug) debug_printf(format, text.c_str());
-    if (write_opt_info && finfo) info_printf(format, text.c_str());
+void tell(const std::string& text) {
+    if (print_debug) debug_printf("%s", text.c_str());
+    if (write_opt_info && finfo) info_printf("%s", text.c_str());
 }
 
 void report_estimated_speedup(const LOOP_UNROLLING_INFO& info) {
@@ -61,17 +60,18 @@ void report_estimated_speedup(const LOOP_UNROLLING_INFO& info) {
                   static_cast<double>(info.originalTimeCost) * uf / static_cast<double>(std::max<uint64_t>(info.unrolledTimeCost, 1)),
                   static_cast<double>(space) / static_cast<double>(std::max<uint64_t>(info.originalSpaceCost, 1)),
                   static_cast<unsigned long>(info.originalSpaceCost), static_cast<unsigned long>(space));
-    tell("%s", text);
+    tell(text);
 }
 
 void report_total_unrolling_factor(const LOOP_UNROLLING_INFO& info) {
     if (info.loop->unrollAmount > 1)
-        tell("Total unrolling factor for this loop: %sx\n", std::to_string(info.loop->unrollAmount * info.unrolledFactor));
+        tell("Total unrolling factor for this loop: " + std::to_string(info.loop->unrollAmount * info.unrolledFactor) + "x\n");
 }
 
 void report_for_unroll_for_speed(const LOOP_UNROLLING_INFO& info) {
     const int factor = static_cast<int>(info.unrolledFactor);
-    tell("%s", text_of_loop(info.loop, info.unrolledCompletely, factor));
+    tell("Unrolling " + text_of_loop(info.loop) + (info.unrolledCompletely ? " completely" : "") + " by factor " +
+         std::to_string(factor) + ".\n");
     report_estimated_speedup(info);
     report_total_unrolling_factor(info);
     if (print_debug && fdebug) info.print("unrolled", fdebug);
@@ -232,12 +232,21 @@ bool cd_unroll_loops_by_request() {
 namespace {
 
 bool unroll_for_speed(struct LOOP* loop, bool completely) {
-    if (requested_factor(loop) != 0 || !loop_is_OK_for_unrolling(loop, false, nullptr)) return false;
+    std::string why;
+    if (requested_factor(loop) != 0) return false;
+    if (!loop_is_OK_for_unrolling(loop, false, &why)) {
+        if (print_debug) debug_printf("\tNot unrolling %s: %s\n", text_of_loop(loop).c_str(), why.c_str());
+        return false;
+    }
     UNROLLED_BODY body(loop);
     LOOP_UNROLLING_INFO info(loop);
     info.characterize_body(body);
     info.characterize_loop_before_unrolling();
     const bool peeled = info.select_unrolling_factor(completely);
+    if (info.unrolledFactor < 2 && print_debug) {
+        debug_printf("\tNot unrolling %s: no factor pays\n", text_of_loop(loop).c_str());
+        info.print("not unrolled", fdebug);
+    }
     if (info.unrolledFactor < 2 || !rewrite_is_allowed(loop->tail->branch())) return false;
     unroll(info, peeled, body);
     return true;

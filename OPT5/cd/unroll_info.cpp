@@ -36,7 +36,13 @@ uint64_t time_of(const NODE* t) {
     return cost;
 }
 
-uint64_t space_of(const NODE* t) { return static_cast<uint64_t>(count_nodes_in_tree(t)); }
+uint64_t space_of(const NODE* t) {
+    uint64_t cost = 0;
+    for_each_subtree(t, [&cost](const NODE* n) {
+        cost += n->op == UMULT ? 1 + (n->right != nullptr) : n->op != UAND && weight_of_operator(n) != 0;
+    });
+    return cost;
+}
 
 INT65 modulo(INT65 v, INT65 m) {
     const INT65 r = v % m;
@@ -134,7 +140,6 @@ void LOOP_UNROLLING_INFO::characterize_body(const UNROLLED_BODY& body) {
         for (const LIST* s = bb->statements; s; s = s->rest) {
             const NODE* t = s->first;
             if (t->op == NASSERT || (t->op == BRANCH && bb != loop->tail)) continue;
-            ++statements;
             numberOfIFs += t->op == IF;
             for_each_subtree(t, [this](const NODE* n) {
                 if (n->op != QUEST) return;
@@ -232,13 +237,7 @@ bool LOOP_UNROLLING_INFO::peel_excess_loop_iterationsp() const {
     if (unrolledCompletely || !count_is_exact() || !rest_can_be_made(loop)) return false;
     if (u == userRequestedUF) return !is_multiple_of(u);
     if (!maximumTripCount.is_zero() && maximumTripCount <= INT65(static_cast<int64_t>(u))) return false;
-    // A multiple leaves nothing over.
-    if (is_multiple_of(u)) return false;
-    if (loop->test == EQ || loop->test == NEQ) return true;
-    if (5 * testTimeCost >= originalTimeCost * terminationTestFactor) return true;
-    if (5 * testSpaceCost >= originalSpaceCost * terminationTestFactor) return true;
-    if (u > 3) return true;
-    return statements < 5 && originalSpaceCost + unrolledSpaceCost < 56;
+    return !is_multiple_of(u);
 }
 
 REST LOOP_UNROLLING_INFO::rest() const {

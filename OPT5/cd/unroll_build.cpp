@@ -76,13 +76,16 @@ void UNROLLED_BODY::find_steps() {
             for_each_written_name(s->first, [&](const NODE* name, const NODE*) { ++writes[name->u.sym]; });
     for (size_t b = 0; b < blocks.size(); ++b)
         for (const LIST* s = blocks[b]->statements; s; s = s->rest) {
-            STEPPED v{{}, s->first, b, {}};
+            STEPPED v{{}, s->first, b, {}, false, 0};
             if (!read_variable_step(s->first, &v.step) || writes[v.step.sym] != 1) continue;
             const TYPE* type = v.step.sym->type;
             if (!is_private_scalar(v.step.sym) || type->is_volatile() || find_widened_symbol_entry(v.step.sym) ||
                 (!type->is_pointer() && !type->is_int()) || type->is_bool() || type->size > 32 ||
                 !runs_always(blocks[b]))
                 continue;
+            const LOOPIV* iv = find_LOOPIV_for_IV(v.step.sym, loop, false);
+            v.start_is_known = iv && iv->init && iv->init->op == ICON && type->is_int();
+            if (v.start_is_known) v.start = truncate_to_type(iv->init->u.lval, v.step.sym->type->stqs());
             for (size_t other = 0; other < blocks.size(); ++other)
                 v.behind.push_back(other != b && reaches(b, other, blocks.size()));
             stepped.push_back(std::move(v));
@@ -95,13 +98,21 @@ namespace {
 
 struct MOVED {
     const STEPPED* by;
-    int64_t times; // steps that it was not given
+    int64_t times;     // steps that it was not given
+    const INT65* from; // its value before the first copy; null: not known, or not a constant
 };
+
+// A new tree.
+NODE* value_of(const MOVED& m) {
+    const VARIABLE_STEP& step = m.by->step;
+    const INT65 distance = step.c * INT65(m.times);
+    return m.from ? mk_ICON(*m.from + distance, step.sym->type->stqs()) : value_behind_step(step, distance);
+}
 
 const MOVED* find(const std::vector<MOVED>& moved, const NODE* t) {
     if (t->op != NAME) return nullptr;
     for (const MOVED& m : moved)
-        if (m.by->step.sym == t->u.sym && m.times) return &m;
+        if (m.by->step.sym == t->u.sym) return &m;
     return nullptr;
 }
 
@@ -111,11 +122,11 @@ NODE* behind_steps(NODE* t, const std::vector<MOVED>& moved) {
     if (!t) return nullptr;
     if (const MOVED* m = find(moved, t)) {
         erase_tree(t);
-        return value_behind_step(m->by->step, m->by->step.c * INT65(m->times));
+        return value_of(*m);
     }
     if (t->op == SCONV && t->type->is_int() && t->left->type->is_int() && t->left->type->is_signed() &&
         t->type->size > t->left->type->size)
-        if (const MOVED* m = find(moved, t->left))
+        if (const MOVED* m = find(moved, t->left); m && !m->from)
             return maketree(PLUS, t, mk_integer_constant(m->by->step.c * INT65(m->times), t->type), t->type);
     t->left = behind_steps(t->left, moved);
     t->right = behind_steps(t->right, moved);
@@ -132,19 +143,23 @@ NODE* UNROLLED_BODY::in_copy(const NODE* statement, size_t block, int k, int of)
     for (const STEPPED& v : stepped) {
         if (v.statement == statement) {
             if (!is_last) return nullptr;
-            return mk_ASG(mk_NAME(v.step.sym), value_behind_step(v.step, v.step.c * INT65(of)));
+            return mk_ASG(mk_NAME(v.step.sym), value_of({&v, of, known_start(v)}));
         }
         bool is_behind = v.behind[block];
         for (const LIST* s = blocks[block]->statements; v.block == block && s && s->first != statement; s = s->rest)
             is_behind |= s->first == v.statement;
         const int64_t times = is_behind ? (is_last ? 0 : k + 1) : k;
-        if (times && sym_appears_in_tree(v.step.sym, statement)) moved.push_back({&v, times});
+        const INT65* from = known_start(v);
+        if ((times || (from && !is_behind)) && sym_appears_in_tree(v.step.sym, statement)) moved.push_back({&v, times, from});
     }
     NODE* t = strip_ddep_info_from_tree(copy_tree(statement));
     if (moved.empty()) return t;
     t = behind_steps(denormalize_tree(t, false), moved);
-    return normalize_tree(simp_tree(t, nullptr), nullptr);
+    return normalize_tree(simp_tree(t, loop), nullptr);
 }
+
+// Of copies that take the loop's place: what it begins with.
+const INT65* UNROLLED_BODY::known_start(const STEPPED& v) const { return in_place && v.start_is_known ? &v.start : nullptr; }
 
 // All but the control statement.
 LIST* UNROLLED_BODY::statements_of(size_t block, int k, int of) const {
@@ -250,7 +265,10 @@ void UNROLLED_BODY::unroll(int factor) {
     replace_body(factor, control);
 }
 
-void UNROLLED_BODY::unroll_completely(int count) { replace_body(count, mk_BRANCH(exit)); }
+void UNROLLED_BODY::unroll_completely(int count) {
+    in_place = true;
+    replace_body(count, mk_BRANCH(exit));
+}
 
 namespace {
 

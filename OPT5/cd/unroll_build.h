@@ -16,6 +16,8 @@ struct STEPPED {
     const NODE* statement;
     size_t block;            // of the statement, in UNROLLED_BODY::blocks
     std::vector<bool> behind; // by block: whether it runs behind that one in an iteration
+    bool start_is_known;      // what it holds on entry to the loop
+    INT65 start;
 };
 
 // What is left over where the count is no multiple of the factor.
@@ -57,6 +59,7 @@ private:
     BLOCKS new_blocks(struct LOOP* in);
     void fill(const BLOCKS& copy, int k, int of, NODE* control, PSN* psn);
     LIST* statements_of(size_t block, int k, int of) const;
+    const INT65* known_start(const STEPPED& v) const;
     NODE* in_copy(const NODE* statement, size_t block, int k, int of) const;
     BBLK* new_block(struct LOOP* in);
     BBLK* new_part(int count, BBLK* behind);
@@ -73,4 +76,5 @@ private:
     BBLK* last;     // in the text, of what was made so far
     bool stays_if_true;
     std::vector<STEPPED> stepped;
+    bool in_place = false; // the copies run once, from where the loop begins
 };

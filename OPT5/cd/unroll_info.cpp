@@ -259,6 +259,17 @@ bool is_power_of_two(int64_t n) { return (n & (n - 1)) == 0; }
 
 } // namespace
 
+// The tests of what is left over cost more than a short loop gains.
+int LOOP_UNROLLING_INFO::most_copies_beside_rest() const {
+    INT65 most = maximumTripCount.is_zero() ? no_trip_bound() : maximumTripCount;
+    if (loop->probIterate) {
+        const INT65 likely = get_PPRAGMA_tree_int_arg(loop->probIterate, 1);
+        if (likely > INT65(0)) most = std::min(most, likely, [](INT65 a, INT65 b) { return a < b; });
+    }
+    if (most >= INT65(8 * MOST_COPIES)) return MOST_COPIES;
+    return most > INT65(15) ? (most / INT65(8)).fits_in<int32_t>() : 1;
+}
+
 bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
     unrolledFactor = 1;
     const INT65 amount = loop->unrollAmount >= 2 ? INT65(loop->unrollAmount) : INT65(1);
@@ -266,11 +277,6 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
     const INT65 n = maximumTripCount.is_zero() ? INT65(std::numeric_limits<int64_t>::max()) : maximumTripCount;
     if (n < INT65(2)) return false;
     if (INT65(m) > n / INT65(2) && n > INT65(m)) m = (n / INT65(2)).fits_in<int64_t>();
-    // A short loop is as likely as not to end before its copies do.
-    if (loop->probIterate) {
-        const INT65 likely = get_PPRAGMA_tree_int_arg(loop->probIterate, 1);
-        if (likely > INT65(0)) m = std::min(m, (likely / INT65(2)).fits_in<int64_t>());
-    }
     std::vector<int> candidates;
     const INT65 coefficient = loop->trips ? is_icon(loop->trips) ? loop->trips->u.lval : max_ICON_coef(loop->trips) : INT65(1);
     if (originalSpaceCost <= MOST_ORIGINAL_SPACE)
@@ -292,7 +298,7 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
         trial.unrolledTimeCost = originalTimeCost * static_cast<uint64_t>(u);
         trial.unrolledSpaceCost = originalSpaceCost * static_cast<uint64_t>(u);
         const bool p = trial.peel_excess_loop_iterationsp();
-        if (p && !is_icon(loop->trips) && u > MOST_PEELED_COPIES) continue;
+        if (p && !is_icon(loop->trips) && u > std::min(MOST_PEELED_COPIES, most_copies_beside_rest())) continue;
         if (p && !loop->trips) break;
         if (p && !is_icon(loop->trips) && !is_power_of_two(u)) continue;
         trial.characterize_unrolled_loop(u, 0, p);

@@ -50,6 +50,7 @@ struct LOOP_UNROLLING_INFO {
 private:
     bool count_is_exact() const;
     bool is_multiple_of(uint32_t uf) const;
+    int most_copies_beside_rest() const;
 
     uint64_t testTimeCost = 0, testSpaceCost = 0;
     uint64_t stepTimeCost = 0, stepSpaceCost = 0; // of what copies leave out

@@ -17,6 +17,7 @@
 #include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/target/target.h"
 
 #include <algorithm>
 #include <vector>
@@ -162,7 +163,13 @@ std::vector<struct LOOP*> innermost_loops() {
     return loops;
 }
 
+// Of a constant: what the division becomes later may be in a loop of any kind.
+bool division_disappears(const NODE* division) {
+    return division->type->is_int() && division->right->op == ICON && !division->right->u.lval.is_zero();
+}
+
 bool has_work() {
+    unrolling_callbacks.division_disappears = division_disappears;
     return loop_root() && opt_level() >= 2 && !currfuninfo->saves_environment && !currfuninfo->bb_list->is_in_LIR_form();
 }
 

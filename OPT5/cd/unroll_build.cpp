@@ -88,8 +88,39 @@ void UNROLLED_BODY::find_steps() {
             if (v.start_is_known) v.start = truncate_to_type(iv->init->u.lval, v.step.sym->type->stqs());
             for (size_t other = 0; other < blocks.size(); ++other)
                 v.behind.push_back(other != b && reaches(b, other, blocks.size()));
-            stepped.push_back(std::move(v));
+            if (!is_read_often(v)) stepped.push_back(std::move(v));
         }
+}
+
+namespace {
+
+// Reads of the variable other than in addresses, where a sum costs nothing.
+double value_reads(const SYMTAB* sym, const NODE* t) {
+    double n = 0;
+    for (; t; t = t->left) {
+        if (t->op == UMULT) return n;
+        n += t->op == NAME && t->u.sym == sym;
+        n += value_reads(sym, t->right);
+    }
+    return n;
+}
+
+} // namespace
+
+// A variable that is read more than once in an iteration steps in each copy: sums would cost more.
+bool UNROLLED_BODY::is_read_often(const STEPPED& v) const {
+    double reads = 0;
+    for (const BBLK* bb : blocks)
+        for (const LIST* s = bb->statements; s; s = s->rest)
+            if (s->first != v.statement && !(bb == loop->tail && !s->rest))
+                reads += value_reads(v.step.sym, s->first) * (runs_always(bb) ? 1 : 0.5);
+    return reads >= (blocks.size() > 1 ? 2 : 3);
+}
+
+const STEPPED* UNROLLED_BODY::step_of(const SYMTAB* sym) const {
+    for (const STEPPED& v : stepped)
+        if (v.step.sym == sym) return &v;
+    return nullptr;
 }
 
 // ---- Statements

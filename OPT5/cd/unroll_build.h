@@ -35,6 +35,7 @@ public:
 
     // Statements that copies leave out; they are the same in each.
     const std::vector<STEPPED>& steps() const { return stepped; }
+    const STEPPED* step_of(const SYMTAB* sym) const; // null for another variable
     // One of the body's blocks that runs once in each iteration.
     bool runs_always(const BBLK* bb) const;
 
@@ -54,6 +55,7 @@ private:
     using BLOCKS = std::vector<BBLK*>; // of a copy, in the order of `blocks`
 
     void find_steps();
+    bool is_read_often(const STEPPED& v) const;
     bool reaches(size_t from, size_t to, size_t without) const;
     size_t place_of(const BBLK* bb) const; // blocks.size() for one outside
     BLOCKS new_blocks(struct LOOP* in);

@@ -6,6 +6,7 @@
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/opcodes.h"
 #include "OPT5/ir/trees.h"
+#include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
 #include "OPT5/scalar/triples.h"
 #include "OPT5/simp/symbolic.h"
@@ -133,10 +134,41 @@ bool LOOP_UNROLLING_INFO::is_multiple_of(uint32_t uf) const {
 
 // ---- Costs
 
+namespace {
+
+// What copies in the loop's place execute more in an iteration, for accesses to elements of objects at indexes that are
+// known there: in the loop these are made through pointers that step along, in the copies each takes the address anew; but
+// an element of a constant object is a constant.
+int64_t cost_of_places(const NODE* t, const UNROLLED_BODY& body, int64_t* pointers) {
+    int64_t cost = 0;
+    for_each_subtree(t, [&](const NODE* access) {
+        if (access->op != UMULT || !access->right) return;
+        bool has_object = false, is_constant = access->type->is_scalar(), is_known = true, moves = false;
+        for_each_subtree(access, [&](const NODE* n) {
+            if (n->op == UAND) {
+                has_object = true;
+                const NODE* object = without_members(static_cast<const NODE*>(n->left));
+                is_constant &= object->op == NAME && lvalue_is_immutable(object);
+            } else if (n->op == NAME && !n->type->is_array()) {
+                const STEPPED* v = body.step_of(n->u.sym);
+                moves |= v != nullptr;
+                is_known &= v && v->start_is_known;
+            } else if (n != access && n->op == UMULT)
+                is_known = false;
+        });
+        *pointers += moves;
+        if (has_object && is_known) cost += is_constant ? -2 : 1;
+    });
+    return cost;
+}
+
+} // namespace
+
 void LOOP_UNROLLING_INFO::characterize_body(const UNROLLED_BODY& body) {
     for (const BBLK* bb : loop->contents) {
         const bool always = body.runs_always(bb);
         uint64_t time = 0;
+        int64_t places = 0;
         for (const LIST* s = bb->statements; s; s = s->rest) {
             const NODE* t = s->first;
             if (t->op == NASSERT || (t->op == BRANCH && bb != loop->tail)) continue;
@@ -147,9 +179,11 @@ void LOOP_UNROLLING_INFO::characterize_body(const UNROLLED_BODY& body) {
                 predicatedSpaceCost += space_of(n->right);
             });
             time += time_of(t);
+            places += cost_of_places(t, body, &entryTimeCost);
             originalSpaceCost += space_of(t);
         }
         originalTimeCost += always ? time : (time + 1) / 2;
+        placesTimeCost += always ? places : places / 2;
     }
     testTimeCost = time_of(loop->tail->branch());
     testSpaceCost = space_of(loop->tail->branch());
@@ -176,6 +210,8 @@ void LOOP_UNROLLING_INFO::characterize_unrolled_loop(int uf, int requested, bool
         unrolledTimeCost -= (copies - 1) * stepTimeCost;
         unrolledSpaceCost -= (copies - 1) * stepSpaceCost;
     }
+    if (unrolledCompletely)
+        unrolledTimeCost = static_cast<uint64_t>(std::max<int64_t>(1, static_cast<int64_t>(unrolledTimeCost) + (uf - 1) * placesTimeCost - entryTimeCost));
     peeledIterationCount = is_peeled ? unrolledFactor - 1 : 0;
     peeledIterationTimeCost = is_peeled ? originalTimeCost : 0;
     peeledIterationSpaceCost = peeledIterationCount * (originalSpaceCost - testSpaceCost);
@@ -300,6 +336,7 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
         const bool p = trial.peel_excess_loop_iterationsp();
         if (p && !is_icon(loop->trips) && u > std::min(MOST_PEELED_COPIES, most_copies_beside_rest())) continue;
         if (p && !loop->trips) break;
+        if (p && n < INT65(2 * u)) continue; // the copies would run once
         if (p && !is_icon(loop->trips) && !is_power_of_two(u)) continue;
         trial.characterize_unrolled_loop(u, 0, p);
         const float s = static_cast<float>(trial.unrolledSpaceCost + trial.peeledIterationSpaceCost) / static_cast<float>(originalSpaceCost);

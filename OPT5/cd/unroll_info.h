@@ -54,6 +54,8 @@ private:
 
     uint64_t testTimeCost = 0, testSpaceCost = 0;
     uint64_t stepTimeCost = 0, stepSpaceCost = 0; // of what copies leave out
+    int64_t entryTimeCost = 2; // of pointers and a limit, ahead of a loop
+    int64_t placesTimeCost = 0; // of an iteration more, in the loop's place
     bool peeled = false;
 };
 

@@ -14,6 +14,8 @@ INCLUDE = ROOT / "tools" / "include"
 # Well above what any test program needs; an optimizer that makes a loop endless shall not hang the bench.
 MAX_STEPS = 400_000_000
 TIME_LIMIT = 120
+# For tests of what is told of a loop as it is written.
+LOOPS_STAY = "--debug:skip=cd-unroll-by-request+cd-unroll-completely-for-speed+cd-unroll-for-speed"
 
 
 class Trouble(Exception):

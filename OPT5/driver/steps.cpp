@@ -22,6 +22,7 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/remark.h"
 #include "OPT5/ir/scope.h"
 #include "OPT5/ir/symtab.h"
 #include "OPT5/lir/lir.h"
@@ -186,7 +187,16 @@ void sink_definitions() {
     if (sink_unused_definitions(root())) drop_hierarchy();
 }
 
+// The programmer is told of loops as they are written.
+void tell_ahead_of_copies() {
+    if (!remarks_are_wanted) return;
+    init_dependence_analysis();
+    tell_of_loops(root());
+    wrapup_dependence_analysis(false);
+}
+
 void unroll_by_request() {
+    tell_ahead_of_copies();
     if (cd_unroll_loops_by_request()) drop_hierarchy();
 }
 
@@ -206,11 +216,6 @@ void collapse_loops() {
     init_dependence_analysis();
     collapse_dd_loops(root());
     wrapup_dependence_analysis(false);
-}
-
-void advise() {
-    report_ambiguous_aliases(root());
-    tell_of_loops(root());
 }
 
 void circular_addressing() {
@@ -303,7 +308,7 @@ const ROW steps[] = {
     /* 51 */ {L, "explode_arrays", nullptr, L2, explode_local_arrays, none, none},
     /* 52 */ {L, "unroll_for_SP", &D_with_dependence, L2, [] { unroll_loops_for_SP(root()); }, none, none},
     /* 53 */ {L, "simplify_useless_loop_clones", nullptr, always, nothing, none, none},
-    /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, advise, none, every},
+    /* 54 */ {F, "alias_advice", &D_with_dependence, L2_with_loops, [] { report_ambiguous_aliases(root()); }, none, every},
     /* 55 */ {L, "reduction_interleaving", &D_with_dependence, L2, [] { interleave_reductions_in_loop(root(), true); }, none, none},
     /* 56 */ {F, "value_propagation", nullptr, L2_without_loops, value_propagation, alias_marks, graph | alias_marks},
     /* 57 */ {F, "DIVs_by_ICONs", &D_where_loops_are, always, transform_DIVs_by_ICONs, none, every},

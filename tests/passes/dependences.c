@@ -1,5 +1,5 @@
 // What the code generator is told of accesses: by `<` they keep the iterations of a loop apart.
-// RUN: --opt_level=2 --float_support=fpu32 --disable_inlining
+// RUN: --opt_level=2 --float_support=fpu32 --disable_inlining --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <zrun.h>
 
 int a[128], b[128];

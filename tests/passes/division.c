@@ -1,5 +1,5 @@
 // A division or modulo by a constant becomes a product with a scaled reciprocal, or a shift; nothing is evaluated twice.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <zrun.h>
 
 int a[4] = {100, -100, 32767, -7};

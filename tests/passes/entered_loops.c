@@ -1,5 +1,5 @@
 // A loop whose counter starts from a constant is entered behind its first test.
-// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg
+// RUN: --opt_level=2 --debug:skip=ssa-rp-with-benign-loads+ssa-reg-promote+ssa-reg-promote-with-simpcfg+cd-unroll-completely-for-speed+cd-unroll-for-speed
 // LEVELS: 3
 #include <zrun.h>
 

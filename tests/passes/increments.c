@@ -1,5 +1,5 @@
 // A pointer's step becomes part of the reference beside it.
-// RUN: --opt_level=2 --disable_inlining
+// RUN: --opt_level=2 --disable_inlining --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 // LEVELS: 0 1 3 4
 #include <zrun.h>
 

@@ -1,6 +1,6 @@
 // A loop is closed by one conditional branch, and is one piece of text: its test moves to its end, or stands there a
 // second time, and what it is left to stands behind it.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <zrun.h>
 
 int g[8];

@@ -1,5 +1,5 @@
 // What is known of loop variables and counts shows in the promises; a counter is no wider than its values.
-// RUN: --opt_level=2 --disable_inlining
+// RUN: --opt_level=2 --disable_inlining --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <stdlib.h>
 #include <zrun.h>
 

@@ -1,5 +1,5 @@
 // Addresses that move with a loop's counter become pointers; a counter that nothing else needs goes.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <zrun.h>
 
 int a[300], b[300];

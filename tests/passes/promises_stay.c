@@ -1,5 +1,5 @@
 // A loop's pragma is followed by that loop's own label, however the blocks are laid out.
-// RUN: --opt_level=2
+// RUN: --opt_level=2 --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <zrun.h>
 
 int g[8];

@@ -1,5 +1,5 @@
 // What each iteration of a loop assigns and the loop does not read is assigned behind it.
-// RUN: --opt_level=2 --disable_inlining --debug:hierarchy
+// RUN: --opt_level=2 --disable_inlining --debug:hierarchy --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 #include <zrun.h>
 
 int a[8], b[8];

@@ -1,5 +1,5 @@
 // What values a variable may have decides tests, remainders and choices; what it may not have does not.
-// RUN: --opt_level=2 --disable_inlining
+// RUN: --opt_level=2 --disable_inlining --debug:skip=cd-unroll-completely-for-speed+cd-unroll-for-speed
 // LEVELS: 1 3
 #include <intrinsics.h>
 #include <zrun.h>

@@ -10,7 +10,7 @@ HERE = Path(__file__).resolve().parent
 sys.path.insert(0, str(HERE.parent.parent / "tools"))
 import affine_nests  # noqa: E402
 from icparse_lib import cli  # noqa: E402
-from zbench import INCLUDE, Tools, difference  # noqa: E402
+from zbench import INCLUDE, LOOPS_STAY, Tools, difference  # noqa: E402
 
 DECLARATIONS = """
 int a[1000], d[1000]; long b[1000]; long long e[500]; int c[100][20]; long m[40][30];
@@ -89,7 +89,7 @@ class Dependence(unittest.TestCase):
             path, unit, out = (Path(folder) / name for name in ("p.c", "p.if", "p.opt"))
             path.write_text(source)
             self.assertEqual(cli.main(["-w", "-I", str(INCLUDE), str(path), "-o", str(unit)]), 0)
-            tools.optimize(unit, out, ["--opt_level=2", "--float_support=fpu32", "--disable_inlining"])
+            tools.optimize(unit, out, ["--opt_level=2", "--float_support=fpu32", "--disable_inlining", LOOPS_STAY])
             dump = tools.dump(out)
         parts = {int(p[1]): p[2] for p in re.finditer(r"function _f(\d+):(.*?)end function", dump, re.S)}
         return [parts[i] for i in range(len(statements))]

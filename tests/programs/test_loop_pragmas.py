@@ -10,7 +10,7 @@ from unittest import mock
 HERE = Path(__file__).resolve().parent
 sys.path.insert(0, str(HERE.parent.parent / "tools"))
 from icparse_lib import cli, pragmas  # noqa: E402
-from zbench import INCLUDE, Tools  # noqa: E402
+from zbench import INCLUDE, LOOPS_STAY, Tools  # noqa: E402
 
 ORDER = [125, 124, 123, 112, 66, 67, 65, 64, 63, 56, 68, 41, 38, 37, 39, 40, 121, 80, 60, 42, 43, 44]
 LISTS = [60, 42, 43, 44]
@@ -63,6 +63,7 @@ class LoopPragmas(unittest.TestCase):
                 # A stable sort: those of a list stay as they were.
                 want = [sorted(g, key=lambda p: ORDER.index(p[0])) for g in groups(tools.dump(unit))]
                 for words in (["--opt_level=2"], ["--opt_level=3", "--float_support=fpu32"], ["--opt_level=2", "--debug:idle_frames"]):
+                    words.append(LOOPS_STAY)
                     tools.optimize(unit, out, [*words, "--debug:validate"])
                     self.assertEqual(groups(tools.dump(out)), want, (loop, words))
 

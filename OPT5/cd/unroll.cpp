@@ -2,13 +2,14 @@
 //
 //     for (i = 0; i < 32; i++) a[i] = i;        for (i = 0; i < 32; i += 4) { a[i] = i; a[i+1] = i+1; ... }
 //
-// Needs: the loop hierarchy with its counts, trees in normal form. Leaves: blocks numbered, no hierarchy where a loop was
-// unrolled: it is made anew.
-// Sound because of what `UNROLLED_BODY` says, and because a test goes only where the count is proved, or promised, to be a
-// multiple of the factor, or what is left over runs behind the copies. What was promised of the loop is divided.
+// Needs: the loop hierarchy with its counts, trees in normal form. Leaves: blocks numbered, no hierarchy where a loop
+// was unrolled: it is made anew. Sound because of what `UNROLLED_BODY` says, and because a test goes only where the
+// count is proved, or promised, to be a multiple of the factor, or what is left over runs behind the copies. What was
+// promised of the loop is divided.
 #include "OPT5/cd/cd.h"
 
 #include "OPT5/cd/unroll_info.h"
+#include "OPT5/dd/dd.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/facts.h"
 #include "OPT5/ir/funinfo.h"
@@ -31,20 +32,11 @@ bool is_icon(const NODE* t) { return t && t->op == ICON; }
 
 // ---- What the programmer is told
 
-PSN place_of(const struct LOOP* loop) {
-    const SOURCE_PLACE& start = loop->sourceStart;
-    PSN place{nullptr, 0, 0};
-    for (const LIST* s = loop->head->statements; s && place.line == 0; s = s->rest)
-        if (s->psn) place = *s->psn;
-    if (start.line) place = {start.file.empty() ? place.file : start.file.c_str(), start.line, start.column};
-    return place;
-}
-
 std::string text_of_loop(const struct LOOP* loop) {
     if (const NODE* p = loop->sourceLoopPragma)
         return "'" + get_PPRAGMA_tree_arg(p, 3) + "' loop on '" + get_PPRAGMA_tree_arg(p, 1) + "' at lines " +
                get_PPRAGMA_tree_arg(p, 0) + "-" + get_PPRAGMA_tree_arg(p, 2);
-    if (const PSN place = place_of(loop); place.line) return "loop at line " + std::to_string(place.line);
+    if (const PSN place = place_of_loop(loop); place.line) return "loop at line " + std::to_string(place.line);
     return "loop #" + std::to_string(loop->uid);
 }
 
@@ -58,7 +50,8 @@ void report_estimated_speedup(const LOOP_UNROLLING_INFO& info) {
     const double uf = info.unrolledFactor;
     const uint64_t space = info.unrolledSpaceCost + info.peeledIterationSpaceCost;
     std::snprintf(text, sizeof text, "Estimated speedup: %.2fx, code size increase: %.2fx (%lu:->%lu)\n",
-                  static_cast<double>(info.originalTimeCost) * uf / static_cast<double>(std::max<uint64_t>(info.unrolledTimeCost, 1)),
+                  static_cast<double>(info.originalTimeCost) * uf /
+                      static_cast<double>(std::max<uint64_t>(info.unrolledTimeCost, 1)),
                   static_cast<double>(space) / static_cast<double>(std::max<uint64_t>(info.originalSpaceCost, 1)),
                   static_cast<unsigned long>(info.originalSpaceCost), static_cast<unsigned long>(space));
     tell(text);
@@ -66,7 +59,8 @@ void report_estimated_speedup(const LOOP_UNROLLING_INFO& info) {
 
 void report_total_unrolling_factor(const LOOP_UNROLLING_INFO& info) {
     if (info.loop->unrollAmount > 1)
-        tell("Total unrolling factor for this loop: " + std::to_string(info.loop->unrollAmount * info.unrolledFactor) + "x\n");
+        tell("Total unrolling factor for this loop: " + std::to_string(info.loop->unrollAmount * info.unrolledFactor) +
+             "x\n");
 }
 
 void report_for_unroll_for_speed(const LOOP_UNROLLING_INFO& info) {
@@ -77,16 +71,17 @@ void report_for_unroll_for_speed(const LOOP_UNROLLING_INFO& info) {
     report_total_unrolling_factor(info);
     if (print_debug && fdebug) info.print("unrolled", fdebug);
     if (!remarks_are_wanted) return;
-    const PSN place = place_of(info.loop);
-    std::string text = info.unrolledCompletely ? "its " + std::to_string(factor) + " iterations stand one behind the other"
-                                               : std::to_string(factor) + " iterations in one";
+    const PSN place = place_of_loop(info.loop);
+    std::string text = info.unrolledCompletely
+                           ? "its " + std::to_string(factor) + " iterations stand one behind the other"
+                           : std::to_string(factor) + " iterations in one";
     if (info.peeledIterationCount) text += ", what is left over behind them";
     remark("unroll", &place, REMARK::DONE, text);
 }
 
 void refuse(const struct LOOP* loop, const std::string& why) {
     if (!remarks_are_wanted) return;
-    const PSN place = place_of(loop);
+    const PSN place = place_of_loop(loop);
     remark("unroll", &place, REMARK::MISSED, "not unrolled as the pragma asks: " + why);
 }
 
@@ -134,7 +129,9 @@ void unroll(LOOP_UNROLLING_INFO& info, bool peeled, UNROLLED_BODY& body) {
 
 bool cd_condx_unroll_loop_completely(struct LOOP* loop, bool told) {
     const int64_t requested = requested_factor(loop);
-    if (!may_be_looked_at(loop) || loop->has(LOOP_early_exit) || !loop_is_OK_for_unrolling(loop, requested > 0, nullptr)) return false;
+    if (!may_be_looked_at(loop) || loop->has(LOOP_early_exit) ||
+        !loop_is_OK_for_unrolling(loop, requested > 0, nullptr))
+        return false;
     LOOP_UNROLLING_INFO info(loop);
     info.characterize_loop_before_unrolling();
     const INT65 n = info.maximumTripCount;
@@ -142,7 +139,8 @@ bool cd_condx_unroll_loop_completely(struct LOOP* loop, bool told) {
     if (requested > 0 && INT65(requested) < n) return false;
     const int goal = size_speed_goal();
     if (requested == 0) {
-        if (goal < 1 || (goal < 2 && n >= INT65(3)) || (goal < 3 && n >= INT65(5)) || loop->unrollAmount > 1) return false;
+        if (goal < 1 || (goal < 2 && n >= INT65(3)) || (goal < 3 && n >= INT65(5)) || loop->unrollAmount > 1)
+            return false;
     }
     UNROLLED_BODY body(loop);
     info.characterize_body(body);
@@ -170,7 +168,8 @@ bool division_disappears(const NODE* division) {
 
 bool has_work() {
     unrolling_callbacks.division_disappears = division_disappears;
-    return loop_root() && opt_level() >= 2 && !currfuninfo->saves_environment && !currfuninfo->bb_list->is_in_LIR_form();
+    return loop_root() && opt_level() >= 2 && !currfuninfo->saves_environment &&
+           !currfuninfo->bb_list->is_in_LIR_form();
 }
 
 // New symbols get their places, and blocks their numbers.
@@ -230,7 +229,8 @@ bool cd_unroll_loops_by_request() {
     if (!has_work()) return false;
     bool any = false;
     for (struct LOOP* loop : innermost_loops())
-        if (const int64_t factor = requested_factor(loop); factor > 1) any |= unroll_by_request(loop, static_cast<int>(factor));
+        if (const int64_t factor = requested_factor(loop); factor > 1)
+            any |= unroll_by_request(loop, static_cast<int>(factor));
     return finish(any);
 }
 

@@ -4,10 +4,10 @@
 // Leaves: blocks to be numbered; the record of the loop is that of the new one but for what it says of variables and
 // counts, so that the hierarchy is to be built anew.
 // Sound because the statements of the iterations run in their order, each as often as before; only the tests between
-// them go, of which it is known how they come out, and a variable's steps in the copies become the last one's. What reads
-// the variable in between reads the value that it had, by a sum that the program made as well, step by step. A loop that
-// is left in the middle keeps its steps: the variable may be read behind it. Of the copies in what is left over each runs
-// once at most. What was found out about pointers at an access, or of dependences, is not copied.
+// them go, of which it is known how they come out, and a variable's steps in the copies become the last one's. What
+// reads the variable in between reads the value that it had, by a sum that the program made as well, step by step. A
+// loop that is left in the middle keeps its steps: the variable may be read behind it. Of the copies in what is left
+// over each runs once at most. What was found out about pointers at an access, or of dependences, is not copied.
 #include "OPT5/cd/unroll_build.h"
 
 #include "OPT5/alias/effects.h"
@@ -168,7 +168,7 @@ NODE* behind_steps(NODE* t, const std::vector<MOVED>& moved) {
 
 // The statement as copy `k` of `of` has it, null where that has none.
 NODE* UNROLLED_BODY::in_copy(const NODE* statement, size_t block, int k, int of) const {
-    if (statement->op == NASSERT && k > 0) return nullptr;
+    if (statement->op == NASSERT && (k > 0 || !is_in_loop)) return nullptr;
     std::vector<MOVED> moved;
     const bool is_last = k == of - 1;
     for (const STEPPED& v : stepped) {
@@ -181,7 +181,8 @@ NODE* UNROLLED_BODY::in_copy(const NODE* statement, size_t block, int k, int of)
             is_behind |= s->first == v.statement;
         const int64_t times = is_behind ? (is_last ? 0 : k + 1) : k;
         const INT65* from = known_start(v);
-        if ((times || (from && !is_behind)) && sym_appears_in_tree(v.step.sym, statement)) moved.push_back({&v, times, from});
+        if ((times || (from && !is_behind)) && sym_appears_in_tree(v.step.sym, statement))
+            moved.push_back({&v, times, from});
     }
     NODE* t = strip_ddep_info_from_tree(copy_tree(statement));
     if (moved.empty()) return t;
@@ -190,7 +191,9 @@ NODE* UNROLLED_BODY::in_copy(const NODE* statement, size_t block, int k, int of)
 }
 
 // Of copies that take the loop's place: what it begins with.
-const INT65* UNROLLED_BODY::known_start(const STEPPED& v) const { return in_place && v.start_is_known ? &v.start : nullptr; }
+const INT65* UNROLLED_BODY::known_start(const STEPPED& v) const {
+    return in_place && v.start_is_known ? &v.start : nullptr;
+}
 
 // All but the control statement.
 LIST* UNROLLED_BODY::statements_of(size_t block, int k, int of) const {
@@ -264,12 +267,14 @@ void UNROLLED_BODY::replace_body(int count, NODE* control) {
         fill(copies[k], static_cast<int>(k) + 1, count,
              k + 1 < copies.size() ? mk_BRANCH(copies[k + 1].front()) : control, psn);
     const size_t tail = place_of(loop->tail);
+    is_in_loop = !in_place;
     std::vector<LIST*> lists;
     for (size_t b = 0; b < blocks.size(); ++b) {
         LIST* list = statements_of(b, 0, count);
         LIST** end = &list;
         while (*end) end = &(*end)->rest;
-        if (b != tail) *end = mkelist(in_copy(blocks[b]->branch(), b, 0, count), nullptr, blocks[b]->last_statement()->psn);
+        if (b != tail)
+            *end = mkelist(in_copy(blocks[b]->branch(), b, 0, count), nullptr, blocks[b]->last_statement()->psn);
         lists.push_back(list);
     }
     disconnect(loop->tail, loop->head);
@@ -313,8 +318,7 @@ TYPE* unsigned_twin(TYPE* type) {
 // The largest multiple of the factor that is not above the count; `trips` is borrowed.
 NODE* rounded_down(const NODE* trips, int factor) {
     TYPE* type = trips->type->stqs();
-    if ((factor & (factor - 1)) == 0)
-        return maketree(ANDB, copy_tree(trips), mk_ICON(INT65(-factor), type), type);
+    if ((factor & (factor - 1)) == 0) return maketree(ANDB, copy_tree(trips), mk_ICON(INT65(-factor), type), type);
     NODE* over = maketree(MOD, copy_tree(trips), mk_ICON(INT65(factor), type), type);
     return maketree(MINUS, copy_tree(trips), over, type);
 }
@@ -329,13 +333,15 @@ NODE* UNROLLED_BODY::main_loop_test(const NODE* trips, int factor) {
     INT65 step = sign_extend_by_type_size(loop->LCV->incrtree->u.lval, loop->LCV->incrtree->type);
     const bool goes_down = step.is_negative(), is_pointer = counter->type->is_pointer();
     if (goes_down) step = -step;
-    // Where the count fits the variable's type and is the distance, the sum is a number on the course; otherwise it wraps.
+    // Where the count fits the variable's type and is the distance, the sum is a number on the course; otherwise it
+    // wraps.
     const bool is_exact = step == INT65(1) && trips->type->size == type->size && trips->type->is_signed();
     TYPE* in = is_exact || is_pointer ? type : unsigned_twin(type);
     NODE* full = coerce_to_type(in, rounded_down(trips, factor));
     if (step != INT65(1)) full = maketree(MULT, full, mk_ICON(step, in), in);
     const NODE* init = loop->LCV->init;
-    NODE* start = init && init->op == ICON ? mk_ICON(init->u.lval, in) : coerce_to_type(is_pointer ? counter->type->stqs() : in, mk_NAME(counter));
+    NODE* start = init && init->op == ICON ? mk_ICON(init->u.lval, in)
+                                           : coerce_to_type(is_pointer ? counter->type->stqs() : in, mk_NAME(counter));
     TYPE* sum = is_pointer ? counter->type->stqs() : type;
     NODE* end = coerce_to_type(sum, maketree(goes_down ? MINUS : PLUS, start, full, is_pointer ? sum : in));
     end = normalize_tree(simp_tree(end, nullptr), nullptr);
@@ -355,8 +361,8 @@ BBLK* UNROLLED_BODY::new_part(int count, BBLK* behind) {
     std::vector<BLOCKS> copies;
     for (int k = 0; k < count; ++k) copies.push_back(new_blocks(loop->parent));
     for (size_t k = 0; k < copies.size(); ++k)
-        fill(copies[k], static_cast<int>(k), count,
-             mk_BRANCH(k + 1 < copies.size() ? copies[k + 1].front() : behind), psn);
+        fill(copies[k], static_cast<int>(k), count, mk_BRANCH(k + 1 < copies.size() ? copies[k + 1].front() : behind),
+             psn);
     return copies.front().front();
 }
 

@@ -14,7 +14,7 @@ struct LOOP;
 struct STEPPED {
     VARIABLE_STEP step;
     const NODE* statement;
-    size_t block;            // of the statement, in UNROLLED_BODY::blocks
+    size_t block;             // of the statement, in UNROLLED_BODY::blocks
     std::vector<bool> behind; // by block: whether it runs behind that one in an iteration
     bool start_is_known;      // what it holds on entry to the loop
     INT65 start;
@@ -22,9 +22,9 @@ struct STEPPED {
 
 // What is left over where the count is no multiple of the factor.
 struct REST {
-    NODE* trips = nullptr;  // a tree that changes nothing, in normal form; of the caller
-    int64_t count = -1;     // the iterations left over, where that is a constant
-    int64_t multiple = 1;   // a factor of the count
+    NODE* trips = nullptr;   // a tree that changes nothing, in normal form; of the caller
+    int64_t count = -1;      // the iterations left over, where that is a constant
+    int64_t multiple = 1;    // a factor of the count
     bool may_be_less = true; // the count may be below the factor
 };
 
@@ -73,10 +73,11 @@ private:
     NODE* stays_while(int op, NODE* limit) const;
 
     struct LOOP* loop;
-    BLOCKS blocks;  // by number; the head first
-    BBLK* exit;     // where the test leaves to
-    BBLK* last;     // in the text, of what was made so far
+    BLOCKS blocks; // by number; the head first
+    BBLK* exit;    // where the test leaves to
+    BBLK* last;    // in the text, of what was made so far
     bool stays_if_true;
     std::vector<STEPPED> stepped;
-    bool in_place = false; // the copies run once, from where the loop begins
+    bool in_place = false;   // the copies run once, from where the loop begins
+    bool is_in_loop = false; // what is copied stays in the loop, where facts were found of it
 };

@@ -32,7 +32,9 @@ uint64_t time_of(const NODE* t) {
     uint64_t cost = 0;
     for_each_subtree(t, [&cost](const NODE* n) {
         // An address is of its base and offset; in this form the sum is the access's.
-        cost += n->op == UMULT ? 1 + (n->right != nullptr) : n->op == UAND ? 0 : static_cast<uint64_t>(weight_of_operator(n));
+        cost += n->op == UMULT  ? 1 + (n->right != nullptr)
+                : n->op == UAND ? 0
+                                : static_cast<uint64_t>(weight_of_operator(n));
     });
     return cost;
 }
@@ -90,7 +92,8 @@ bool is_left_to_multiplier(const struct LOOP* loop) {
 
 bool loop_is_OK_for_unrolling(struct LOOP* loop, bool requested, std::string* why) {
     const char* reason = why_not(loop, requested);
-    if (!reason && !requested && is_left_to_multiplier(loop)) reason = "the multiplier adds up one product an iteration";
+    if (!reason && !requested && is_left_to_multiplier(loop))
+        reason = "the multiplier adds up one product an iteration";
     if (reason && why) *why = reason;
     return !reason;
 }
@@ -137,8 +140,8 @@ bool LOOP_UNROLLING_INFO::is_multiple_of(uint32_t uf) const {
 namespace {
 
 // What copies in the loop's place execute more in an iteration, for accesses to elements of objects at indexes that are
-// known there: in the loop these are made through pointers that step along, in the copies each takes the address anew; but
-// an element of a constant object is a constant.
+// known there: in the loop these are made through pointers that step along, in the copies each takes the address anew;
+// but an element of a constant object is a constant.
 int64_t cost_of_places(const NODE* t, const UNROLLED_BODY& body, int64_t* pointers) {
     int64_t cost = 0;
     for_each_subtree(t, [&](const NODE* access) {
@@ -211,7 +214,8 @@ void LOOP_UNROLLING_INFO::characterize_unrolled_loop(int uf, int requested, bool
         unrolledSpaceCost -= (copies - 1) * stepSpaceCost;
     }
     if (unrolledCompletely)
-        unrolledTimeCost = static_cast<uint64_t>(std::max<int64_t>(1, static_cast<int64_t>(unrolledTimeCost) + (uf - 1) * placesTimeCost - entryTimeCost));
+        unrolledTimeCost = static_cast<uint64_t>(
+            std::max<int64_t>(1, static_cast<int64_t>(unrolledTimeCost) + (uf - 1) * placesTimeCost - entryTimeCost));
     peeledIterationCount = is_peeled ? unrolledFactor - 1 : 0;
     peeledIterationTimeCost = is_peeled ? originalTimeCost : 0;
     peeledIterationSpaceCost = peeledIterationCount * (originalSpaceCost - testSpaceCost);
@@ -261,7 +265,8 @@ bool LOOP_UNROLLING_INFO::has_one_test() const {
 // What the main loop's test is made of, and that the count is worth its computing.
 static bool rest_can_be_made(const struct LOOP* loop) {
     const LOOPIV* iv = loop->LCV;
-    if (!iv || !is_icon(iv->incrtree) || iv->incrtree->u.lval.is_zero() || find_widened_symbol_entry(iv->sym)) return false;
+    if (!iv || !is_icon(iv->incrtree) || iv->incrtree->u.lval.is_zero() || find_widened_symbol_entry(iv->sym))
+        return false;
     if (!iv->has(IV_affine) || loop->test == EQ || loop->test == ILLOP) return false;
     const NODE* trips = loop->trips;
     if (!trips->type->is_int() || trips->type->size > 32 || tree_has_side_effects(trips)) return false;
@@ -314,7 +319,8 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
     if (n < INT65(2)) return false;
     if (INT65(m) > n / INT65(2) && n > INT65(m)) m = (n / INT65(2)).fits_in<int64_t>();
     std::vector<int> candidates;
-    const INT65 coefficient = loop->trips ? is_icon(loop->trips) ? loop->trips->u.lval : max_ICON_coef(loop->trips) : INT65(1);
+    const INT65 coefficient =
+        loop->trips ? is_icon(loop->trips) ? loop->trips->u.lval : max_ICON_coef(loop->trips) : INT65(1);
     if (originalSpaceCost <= MOST_ORIGINAL_SPACE)
         for (int64_t u = 2; u <= std::min<int64_t>(m, MOST_COPIES); ++u)
             if (is_power_of_two(u) || (coefficient % INT65(u)).is_zero()) candidates.push_back(static_cast<int>(u));
@@ -325,7 +331,8 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
     LOOP_UNROLLING_INFO best = *this;
     float best_z = 1, best_s = 1;
     if (print_debug)
-        debug_printf("Trial unrolling: S(1)=%f T(1)=%f Z(1)=%f trigger(1)=%.3f\n", 1.0, static_cast<double>(originalTimeCost), 1.0, TRIGGER);
+        debug_printf("Trial unrolling: S(1)=%f T(1)=%f Z(1)=%f trigger(1)=%.3f\n", 1.0,
+                     static_cast<double>(originalTimeCost), 1.0, TRIGGER);
     for (const int u : candidates) {
         LOOP_UNROLLING_INFO trial = *this;
         trial.unrolledFactor = static_cast<uint32_t>(u);
@@ -339,17 +346,22 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
         if (p && n < INT65(2 * u)) continue; // the copies would run once
         if (p && !is_icon(loop->trips) && !is_power_of_two(u)) continue;
         trial.characterize_unrolled_loop(u, 0, p);
-        const float s = static_cast<float>(trial.unrolledSpaceCost + trial.peeledIterationSpaceCost) / static_cast<float>(originalSpaceCost);
-        const float z = static_cast<float>(originalTimeCost * static_cast<uint64_t>(u)) / static_cast<float>(std::max<uint64_t>(trial.unrolledTimeCost, 1));
+        const float s = static_cast<float>(trial.unrolledSpaceCost + trial.peeledIterationSpaceCost) /
+                        static_cast<float>(originalSpaceCost);
+        const float z = static_cast<float>(originalTimeCost * static_cast<uint64_t>(u)) /
+                        static_cast<float>(std::max<uint64_t>(trial.unrolledTimeCost, 1));
         if (print_debug)
-            debug_printf("Trial unrolling: S(%d)=%f T(%d)=%f Z(%d)=%f trigger(%d)=%.3f\n\tufBest = %d   deltaZ=%f deltaS=%f  peel@%d?:%s\n\tuf     = %d   deltaZ=%f deltaS=%f\n",
-                         u, static_cast<double>(s), u, static_cast<double>(trial.unrolledTimeCost) / u, u, static_cast<double>(z), u, TRIGGER,
-                         static_cast<int>(best.unrolledFactor), static_cast<double>(best_z - 1), static_cast<double>(best_s - 1), u, p ? "yes" : "no",
-                         u, static_cast<double>(z - best_z), static_cast<double>(s - best_s));
+            debug_printf("Trial unrolling: S(%d)=%f T(%d)=%f Z(%d)=%f trigger(%d)=%.3f\n\tufBest = %d   deltaZ=%f "
+                         "deltaS=%f  peel@%d?:%s\n\tuf     = %d   deltaZ=%f deltaS=%f\n",
+                         u, static_cast<double>(s), u, static_cast<double>(trial.unrolledTimeCost) / u, u,
+                         static_cast<double>(z), u, TRIGGER, static_cast<int>(best.unrolledFactor),
+                         static_cast<double>(best_z - 1), static_cast<double>(best_s - 1), u, p ? "yes" : "no", u,
+                         static_cast<double>(z - best_z), static_cast<double>(s - best_s));
         if (!trial.has_one_test() && !trial.unrolledCompletely) continue;
         const bool gains = z >= best_z && trial.unrolledSpaceCost <= MOST_UNROLLED_SPACE &&
                            (z - best_z >= static_cast<float>(TRIGGER) || best_s >= s);
-        const bool is_pair = u == 2 && n == INT65(2) && trial.unrolledCompletely && loop->level >= 2 && originalSpaceCost < 78;
+        const bool is_pair =
+            u == 2 && n == INT65(2) && trial.unrolledCompletely && loop->level >= 2 && originalSpaceCost < 78;
         if (!gains && !is_pair) continue;
         best = trial;
         best_z = z;
@@ -366,7 +378,8 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
 bool LOOP_UNROLLING_INFO::unrolling_completely_wins(bool told) const {
     if (userRequestedUF) return true;
     const double uf = unrolledFactor;
-    const double z = static_cast<double>(originalTimeCost) * uf / static_cast<double>(std::max<uint64_t>(unrolledTimeCost, 1)),
+    const double z = static_cast<double>(originalTimeCost) * uf /
+                     static_cast<double>(std::max<uint64_t>(unrolledTimeCost, 1)),
                  s = static_cast<double>(unrolledSpaceCost) / static_cast<double>(originalSpaceCost), r = z / s;
     if (told && print_debug) {
         debug_printf("\tSpeed increase: %.3f\n", z);
@@ -399,7 +412,9 @@ std::string decimal(INT65 v) { return std::to_string(v.value); }
 } // namespace
 
 void LOOP_UNROLLING_INFO::print(const char* title, FILE* out) const {
-    auto line = [out](const char* name, const std::string& value) { std::fprintf(out, "  %s: %s\n", name, value.c_str()); };
+    auto line = [out](const char* name, const std::string& value) {
+        std::fprintf(out, "  %s: %s\n", name, value.c_str());
+    };
     auto number = [&line](const char* name, uint64_t value) { line(name, std::to_string(value)); };
     std::fprintf(out, "\nLOOP CHARACTERIZATION FOR UNROLLING (%s)\n", title);
     number("loop", static_cast<uint64_t>(loop->uid));

@@ -1,7 +1,7 @@
 // What is known of a loop that may be unrolled, and what a factor would make of it.
 //
-// Costs are of trees: time is what an iteration executes, in operators by their weight, a block that does not run in each
-// iteration for half; space is operators. A trial computes the costs of the unrolled body, it does not build it.
+// Costs are of trees: time is what an iteration executes, in operators by their weight, a block that does not run in
+// each iteration for half; space is operators. A trial computes the costs of the unrolled body, it does not build it.
 #pragma once
 
 #include "OPT5/cd/unroll_build.h"
@@ -54,8 +54,8 @@ private:
 
     uint64_t testTimeCost = 0, testSpaceCost = 0;
     uint64_t stepTimeCost = 0, stepSpaceCost = 0; // of what copies leave out
-    int64_t entryTimeCost = 2; // of pointers and a limit, ahead of a loop
-    int64_t placesTimeCost = 0; // of an iteration more, in the loop's place
+    int64_t entryTimeCost = 2;                    // of pointers and a limit, ahead of a loop
+    int64_t placesTimeCost = 0;                   // of an iteration more, in the loop's place
     bool peeled = false;
 };
 

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "OPT5/dd/dependence.h"
+#include "UTIL/psn.h"
 
 class NODE;
 struct LOOP; // written out where it is used: an opcode has the same name
@@ -29,6 +30,7 @@ void split_qualified_parameter_copies();
 void report_ambiguous_aliases(struct LOOP* loop);
 // Remarks on the counts of loops and on what keeps their iterations in order (loop_remarks.cpp).
 void tell_of_loops(struct LOOP* root);
+PSN place_of_loop(const struct LOOP* loop); // in the source; its line is 0 where that is not known
 
 // The loop transformations, on the loop and those within. `sink_unused_definitions` tells whether anything moved.
 bool sink_unused_definitions(struct LOOP* loop);

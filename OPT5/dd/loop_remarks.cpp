@@ -16,11 +16,7 @@
 #include <cstdlib>
 #include <vector>
 
-namespace {
-
-constexpr size_t MOST_REFERENCES = 40, MOST_TOLD = 3;
-
-PSN place_of(const struct LOOP* loop) {
+PSN place_of_loop(const struct LOOP* loop) {
     const SOURCE_PLACE& start = loop->sourceStart;
     PSN place{nullptr, 0, 0};
     for (const LIST* s = loop->head->statements; s && place.line == 0; s = s->rest)
@@ -28,6 +24,10 @@ PSN place_of(const struct LOOP* loop) {
     if (start.line) place = {start.file.empty() ? place.file : start.file.c_str(), start.line, start.column};
     return place;
 }
+
+namespace {
+
+constexpr size_t MOST_REFERENCES = 40, MOST_TOLD = 3;
 
 // ---- How often it runs
 
@@ -164,12 +164,12 @@ void tell_of_dependences(struct LOOP* loop, const PSN& place) {
 void tell_of_loops(struct LOOP* root) {
     if (!root || !remarks_are_wanted) return;
     if (root->irreducible) {
-        const PSN place = place_of(root);
+        const PSN place = place_of_loop(root);
         return remark("loops", &place, REMARK::MISSED, "no loop is known here: a goto leads into the middle of one");
     }
     for (struct LOOP* loop : loops_outer_first(root)) {
         if (loop->is_root()) continue;
-        const PSN place = place_of(loop);
+        const PSN place = place_of_loop(loop);
         tell_of_count(loop, place);
         if (!loop_has_subloops(loop)) tell_of_dependences(loop, place);
     }

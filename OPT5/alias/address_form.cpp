@@ -89,16 +89,9 @@ void add_value(ADDRESS_FORM& form, const NODE* t) {
     form.add(t, BITS_PER_UNIT);
 }
 
-const NODE* without_wrappers(const NODE* t) {
-    while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || t->op == DDNODE ||
-           op_wraps_for_SSA(t->op))
-        t = t->left;
-    return t;
-}
-
 void add_lvalue(ADDRESS_FORM& form, const NODE* t) {
     for (;;) {
-        t = without_wrappers(t);
+        t = below_transparent(t);
         if ((t->op == STDOT || t->op == STREF) && t->right && t->right->mval) {
             form.add_constant(t->right->mval->offset);
             if (t->op == STREF) return add_value(form, t->left);
@@ -117,7 +110,7 @@ void add_lvalue(ADDRESS_FORM& form, const NODE* t) {
 }
 
 INT65 access_width(const NODE* t) {
-    t = without_wrappers(t);
+    t = below_transparent(t);
     if ((t->op == STDOT || t->op == STREF) && t->right && t->right->mval && t->right->mval->is_bitfld)
         return INT65(static_cast<int64_t>(t->right->mval->width));
     return INT65(static_cast<int64_t>(t->type->size));
@@ -206,4 +199,11 @@ bool accesses_are_apart(INT65 distance, INT65 step, INT65 width_a, INT65 width_b
     if (step.is_zero()) return distance >= width_a || -distance >= width_b;
     const INT65 behind = residue(distance, step);
     return behind >= width_a && step - behind >= width_b;
+}
+
+const NODE* below_transparent(const NODE* t) {
+    while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || t->op == DDNODE ||
+           op_wraps_for_SSA(t->op))
+        t = t->left;
+    return t;
 }

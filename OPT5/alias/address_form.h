@@ -47,6 +47,8 @@ private:
 bool lvalues_may_be_aliased(const COMPARED_LVALUE& a, const COMPARED_LVALUE& b, struct LOOP* loop = nullptr,
                             bool by_type = true, bool* unsure = nullptr);
 
+// The lvalue or value below what stands for its operand: marks, and operators of SSA form.
+const NODE* below_transparent(const NODE* t);
 ADDRESS_FORM pointer_form(const NODE* pointer); // the place that it points to; no width, no `points_into` of one access
 
 // Whether two accesses are apart wherever the second lies `distance` bits behind the first, plus any multiple of `step`;

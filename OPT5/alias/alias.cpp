@@ -19,16 +19,9 @@ void init_dd_aliasing() { need(fact::alias); }
 
 namespace {
 
-const NODE* without_wrappers(const NODE* t) {
-    while (t->op == IDENTITY || t->op == OUIALIGN || t->op == NONALIGN || t->op == DDNODE ||
-           op_wraps_for_SSA(t->op))
-        t = t->left;
-    return t;
-}
-
 // The pointer that an lvalue is accessed through, null for a NAME.
 const NODE* pointer_of(const NODE* t) {
-    for (t = without_wrappers(t); t->op == STDOT;) t = without_wrappers(t->left);
+    for (t = below_transparent(t); t->op == STDOT;) t = below_transparent(t->left);
     return op_is_indirection(t->op) ? t->left : nullptr;
 }
 
@@ -147,7 +140,7 @@ static bool may_share_stack(TYPE* a, TYPE* b) {
 // The object whose name stands in the lvalue itself, or null.
 static const SYMTAB* object_named_in(const NODE* t) {
     for (;;) {
-        t = without_wrappers(t);
+        t = below_transparent(t);
         if (t->op == STDOT && t->right && t->right->mval)
             t = t->left;
         else if (t->op == UMULT && !t->right && t->left->op == UAND && t->left->type->is_pointer())
@@ -157,7 +150,7 @@ static const SYMTAB* object_named_in(const NODE* t) {
     }
 }
 
-COMPARED_LVALUE::COMPARED_LVALUE(const NODE* t) : lvalue(without_wrappers(t)), is_place(op_is_lvalue(lvalue->op)) {
+COMPARED_LVALUE::COMPARED_LVALUE(const NODE* t) : lvalue(below_transparent(t)), is_place(op_is_lvalue(lvalue->op)) {
     if (!is_place) return;
     volatile_place = lvalue_is_volatile(lvalue);
     named = object_named_in(lvalue);
@@ -270,14 +263,14 @@ bool build_the_umults_alias_free_by_predication_lists(const NODE* a, const NODE*
 // ---- Shapes
 
 bool may_be_an_internal_lvalue(const NODE* t) {
-    for (t = without_wrappers(t); t->op == STDOT;) t = without_wrappers(t->left);
+    for (t = below_transparent(t); t->op == STDOT;) t = below_transparent(t->left);
     if (const SYMTAB* sym = object_name_if_known(t))
         if (is_internal_symbol(sym)) return true;
     return get_vector_or_complex_symbol(t) != nullptr;
 }
 
 bool is_an_array_reference(const NODE* lvalue) {
-    for (lvalue = without_wrappers(lvalue); lvalue->op == STDOT;) lvalue = without_wrappers(lvalue->left);
+    for (lvalue = below_transparent(lvalue); lvalue->op == STDOT;) lvalue = below_transparent(lvalue->left);
     if (lvalue->op != UMULT) return false;
     const SYMTAB* object = address_form(lvalue).object;
     return object && object->type->is_array();

@@ -139,8 +139,8 @@ private:
     void walk(BBLK* bb) {
         POINT point;
         point.loop = bb->loop;
-        if (bb->predecessors && !bb->predecessors->rest)
-            if (auto it = at_end.find(bb->predecessors->first); it != at_end.end()) point.known = it->second;
+        if (const BBLK* before = only_block(bb->predecessors))
+            if (auto it = at_end.find(before); it != at_end.end()) point.known = it->second;
         if (!bb->loop->is_root()) {
             if (bb != bb->loop->head) enter_updates_of_head(&point);
             enter_irregular_updates(&point);

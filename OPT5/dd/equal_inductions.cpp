@@ -78,7 +78,7 @@ private:
         constexpr int MOST_BLOCKS = 4;
         const BBLK* bb = ahead;
         for (int n = 0; bb && n < MOST_BLOCKS && !last_assignment(a, bb).cell && !last_assignment(b, bb).cell; ++n)
-            bb = bb->predecessors && !bb->predecessors->rest ? bb->predecessors->first : nullptr;
+            bb = only_block(bb->predecessors);
         if (!bb) return false;
         ASSIGNMENT first = last_assignment(a, bb), second = last_assignment(b, bb);
         if (!first.value || !second.value) return false;

@@ -274,7 +274,7 @@ void LOOP_FACTS::find_starts() {
                 if (n == 0 && !bb->successors->rest) i->start_statement = root;
             });
         }
-        bb = bb->predecessors && !bb->predecessors->rest ? bb->predecessors->first : nullptr;
+        bb = only_block(bb->predecessors);
     }
 }
 
@@ -362,9 +362,9 @@ bool LOOP_FACTS::is_entered_under(NODE* condition) const {
             break;
         bool stays = !holds;
         for (const LIST* s = bb->statements; s && stays; s = s->rest) stays = !reads.may_be_changed_by(s->first);
-        if (!stays || !bb->predecessors || bb->predecessors->rest) break;
+        if (!stays) break;
         to = bb;
-        bb = bb->predecessors->first;
+        bb = only_block(bb->predecessors);
     }
     erase_tree(condition);
     return holds;

@@ -50,10 +50,6 @@ int cost_of(const NODE* t) {
     return cost;
 }
 
-bool is_plain(const TYPE* t) {
-    return ((t->is_int() && !t->is_bool()) || t->is_float() || t->is_pointer()) && !t->is_complex();
-}
-
 class INVARIANTS {
 public:
     INVARIANTS(NATURAL_LOOPS& all, NATURAL_LOOP* of) : loops(all), loop(of) {}
@@ -107,7 +103,7 @@ private:
 
     bool stays(const NODE* t) {
         if (t->op == UAND) return pointer_is_an_adcon(t);
-        if (!is_plain(t->type)) return false;
+        if (!is_plain_number(t->type)) return false;
         switch (t->op) {
         case ICON:
         case FCON: return true;
@@ -124,7 +120,7 @@ private:
         case UMINUS:
         case NOTB:
         case SCONV:
-        case PCONV: return is_plain(t->left->type) && stays(t->left);
+        case PCONV: return is_plain_number(t->left->type) && stays(t->left);
         default: return false;
         }
     }
@@ -162,7 +158,7 @@ private:
 
     bool enter(NODE** place) {
         NODE* t = *place;
-        if (is_free(t->op) || !is_plain(t->type) || !stays(t)) return false;
+        if (is_free(t->op) || !is_plain_number(t->type) || !stays(t)) return false;
         if (t->type->is_pointer() && t->right->op == ICON) return false;
         if (count_nodes_in_tree(t) > MOST_NODES) return false;
         return add(place);

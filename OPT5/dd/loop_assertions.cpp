@@ -317,9 +317,8 @@ private:
         BBLK* bb = loop->preheader;
         for (;;) {
             if (!walk_back(bb)) return;
-            if (!bb->predecessors || bb->predecessors->rest) return;
-            BBLK* before = bb->predecessors->first;
-            if (before->dfn >= bb->dfn || before->loop != loop->parent) return;
+            BBLK* before = only_block(bb->predecessors);
+            if (!before || before->dfn >= bb->dfn || before->loop != loop->parent) return;
             pass_test(before, bb);
             bb = before;
         }
@@ -471,16 +470,15 @@ static struct LOOP* outermost_loop_that_keeps(const SYMTAB* s, struct LOOP* loop
     return outermost;
 }
 
-// `e` is what holds of the pointer where the outermost of the loops begins that keep it.
+// `e` is what holds of the pointer where the loop begins.
 static void insert_PT_alignment_assertion_in_loop(const PTENV* e, SYMTAB* s, struct LOOP* loop) {
-    struct LOOP* outermost = outermost_loop_that_keeps(s, loop);
     const unsigned align = overall_PT_align(e), plain = std::max(16u, s->type->type_pointed_to()->align);
-    if (!outermost || !e || align <= plain) return;
+    if (!e || align <= plain) return;
     TYPE* type = tp->long_t;
     NODE* rest = maketree(MOD, coerce_to_type(type, mk_NAME(s)), mk_ICON(INT65(align >> 4), type), type);
     NODE* fact = maketree(EQ, rest, mk_ICON(INT65(0), type), tp->int_t);
     if (print_debug) debug_printf("--> Attempting to assert %s\n", tree_to_infix(fact).c_str());
-    add_loop_entry_assertion(fact, outermost);
+    add_loop_entry_assertion(fact, loop);
 }
 
 void assert_pointer_alignments() {
@@ -493,7 +491,7 @@ void assert_pointer_alignments() {
                 if (t->op != NAME || !t->u.sym || !t->u.sym->type->is_pointer()) return;
                 struct LOOP* outermost = outermost_loop_that_keeps(t->u.sym, bb->loop);
                 if (!outermost || !seen.insert({t->u.sym, outermost}).second) return;
-                insert_PT_alignment_assertion_in_loop(PT_info_at_start(t->u.sym, outermost->head), t->u.sym, bb->loop);
+                insert_PT_alignment_assertion_in_loop(PT_info_at_start(t->u.sym, outermost->head), t->u.sym, outermost);
             });
     }
 }

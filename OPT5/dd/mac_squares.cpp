@@ -7,6 +7,7 @@
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/ir/walks.h"
@@ -45,11 +46,11 @@ bool is_load_to_square(const NODE* t) {
 // The load, and both factors.
 bool SQUARES::is_read_here_alone(const SYMTAB* sym) {
     if (mentions.empty())
-        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            for (const LIST* s = bb->statements; s; s = s->rest)
-                for_each_subtree(static_cast<const NODE*>(s->first), [this](const NODE* n) {
-                    if (n->op == NAME) ++mentions[n->u.sym];
-                });
+        for_each_tree(currfuninfo, [this](const NODE* tree) {
+            for_each_subtree(tree, [this](const NODE* n) {
+                if (n->op == NAME) ++mentions[n->u.sym];
+            });
+        });
     return mentions[sym] == 3;
 }
 
@@ -65,12 +66,8 @@ bool SQUARES::read_from_memory(LIST* load, LIST* sum) {
     erase_tree(name);
     const bool is_one = is_mac(square);
     if (is_one) {
-        std::swap(square, sum->first);
-        erase_tree(load->first);
-        load->first = sum->first;
-        sum->first = nullptr;
-        load->rest = sum->rest;
-        delete sum;
+        std::swap(square, load->first);
+        drop_statement_behind(load);
     }
     erase_tree(square);
     return is_one;

@@ -24,8 +24,6 @@ namespace {
 
 constexpr size_t MOST_CHOICES = 4;
 
-BBLK* only(const EDGE* list) { return list && !list->rest ? list->first : nullptr; }
-
 // A loop whose blocks follow each other, but for branches that choose values.
 struct CHAIN {
     std::vector<BBLK*> blocks;  // that each iteration passes
@@ -37,13 +35,13 @@ BBLK* join_of(const BBLK* bb, size_t* arms) {
     const EDGE* e = bb->successors;
     if (!e || !e->rest || e->rest->rest || !is_choice_of_value(bb)) return nullptr;
     BBLK *a = e->first, *b = e->rest->first;
-    const bool a_is_arm = only(a->predecessors) && only(a->successors),
-               b_is_arm = only(b->predecessors) && only(b->successors);
+    const bool a_is_arm = only_block(a->predecessors) && only_block(a->successors),
+               b_is_arm = only_block(b->predecessors) && only_block(b->successors);
     *arms = 1;
-    if (a_is_arm && only(a->successors) == b) return b;
-    if (b_is_arm && only(b->successors) == a) return a;
+    if (a_is_arm && only_block(a->successors) == b) return b;
+    if (b_is_arm && only_block(b->successors) == a) return a;
     *arms = 2;
-    return a_is_arm && b_is_arm && only(a->successors) == only(b->successors) ? only(a->successors) : nullptr;
+    return a_is_arm && b_is_arm && only_block(a->successors) == only_block(b->successors) ? only_block(a->successors) : nullptr;
 }
 
 bool find_chain(const NATURAL_LOOP& loop, const NATURAL_LOOPS& loops, CHAIN* chain) {
@@ -54,13 +52,13 @@ bool find_chain(const NATURAL_LOOP& loop, const NATURAL_LOOPS& loops, CHAIN* cha
         ++seen;
         if (at == loop.latches[0]) break;
         size_t arms = 0;
-        BBLK* next = only(at->successors);
+        BBLK* next = only_block(at->successors);
         if (!next) {
             next = join_of(at, &arms);
             chain->choices.push_back(at);
         }
         if (!next || next == loop.header || !loops.contains(&loop, next)) return false;
-        const bool is_joined_here = arms ? edge_length(next->predecessors) == 2 : only(next->predecessors) == at;
+        const bool is_joined_here = arms ? edge_length(next->predecessors) == 2 : only_block(next->predecessors) == at;
         if (!is_joined_here || ends_in_promise(at)) return false;
         seen += arms;
         at = next;

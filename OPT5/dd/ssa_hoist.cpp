@@ -105,10 +105,6 @@ private:
     std::vector<RCX*> heap;
 };
 
-bool is_plain(const TYPE* t) {
-    return ((t->is_int() && !t->is_bool()) || t->is_float() || t->is_pointer()) && !t->is_complex();
-}
-
 bool computes(int op) {
     return op_is_arithmetic(op) || boolean_result[op] || op == SCONV || op == PCONV || op == DIV || op == MOD;
 }
@@ -130,7 +126,7 @@ public:
         case STREF:
         case STDOT: return operands_hold(t, loop) && is_kept(t, loop);
         default:
-            if (!computes(t->op) || !is_plain(t->type)) return false;
+            if (!computes(t->op) || !is_plain_number(t->type)) return false;
             return holds(t->left, loop) && (!t->right || holds(t->right, loop));
         }
     }
@@ -324,7 +320,7 @@ private:
     static bool is_candidate(const NODE* t) {
         if (!is_small(t)) return false;
         const NODE* access = below_SSA(t);
-        if (access->op == NAME || op_is_SSA_definition(t->op) || is_access_by_name(access) || !is_plain(t->type)) return false;
+        if (access->op == NAME || op_is_SSA_definition(t->op) || is_access_by_name(access) || !is_plain_number(t->type)) return false;
         // An address that is kept in a variable would let the object be reached by pointers.
         if (!good_CSE_tree(access, false) || (t->type->is_pointer() && tree_contains_op(t, UAND))) return false;
         if (!op_is_load(access->op) && !computes(access->op)) return false;

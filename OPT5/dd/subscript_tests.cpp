@@ -65,17 +65,6 @@ namespace {
 
 constexpr int MOST_DIFFERENCES = 64, MOST_ROUNDS = 3;
 
-WIDE gcd_of(WIDE a, WIDE b) {
-    a = a < 0 ? -a : a;
-    b = b < 0 ? -b : b;
-    while (b) {
-        const WIDE r = a % b;
-        a = b;
-        b = r;
-    }
-    return a;
-}
-
 // What a sum can be: `constant` plus a multiple of `step` (0: nothing), within bounds.
 struct SPAN {
     WIDE constant = 0, step = 0;
@@ -198,11 +187,6 @@ struct PAIR {
     UNKNOWN a, b;
     uint64_t levels;
 };
-
-WIDE floor_div(WIDE a, WIDE b) { // b above 0
-    const WIDE q = a / b;
-    return q - (a % b < 0 ? 1 : 0);
-}
 
 // Whether the sum of the terms, in descending order of their factors, may be `v`. Where the last terms together cannot
 // reach from one multiple of what divides the first ones to the next, the sum falls into two of their own.

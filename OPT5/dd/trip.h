@@ -44,9 +44,8 @@ void for_each_block_ahead(const struct LOOP* loop, F&& visit) {
     const BBLK* bb = loop->preheader;
     if (!bb || !visit(bb, static_cast<const NODE*>(nullptr), false)) return;
     for (int n = 0; n < MOST_BLOCKS_AHEAD; ++n) {
-        if (!bb->predecessors || bb->predecessors->rest) return;
-        const BBLK* before = bb->predecessors->first;
-        if (before->dfn >= bb->dfn) return;
+        const BBLK* before = only_block(bb->predecessors);
+        if (!before || before->dfn >= bb->dfn) return;
         const NODE* test = before->branch();
         if (!test || test->op != IF || test->left->op == ENDLOOP) test = nullptr;
         bool sense = false;

@@ -30,13 +30,6 @@ namespace {
 
 const WIDE UNBOUNDED = (static_cast<WIDE>(1) << 64) - 1;
 
-WIDE gcd_of(WIDE a, WIDE b) {
-    if (a < 0) a = -a;
-    if (b < 0) b = -b;
-    while (b) std::swap(a %= b, b);
-    return a;
-}
-
 const NODE* without_conversions(const NODE* t) {
     while (keeps_values(t)) t = t->left;
     return t;

@@ -68,12 +68,6 @@ bool is_inclusive(int op) { return op == LE || op == GE || op == ULE || op == UG
 bool goes_up(int op) { return op == LT || op == LE || op == ULT || op == ULE; }
 bool goes_down(int op) { return op == GT || op == GE || op == UGT || op == UGE; }
 
-WIDE floor_div(WIDE a, WIDE b) { // b above 0
-    const WIDE q = a / b;
-    return q - (a % b < 0 ? 1 : 0);
-}
-WIDE ceil_div(WIDE a, WIDE b) { return -floor_div(-a, b); }
-
 // ---- The control variable's numbers
 
 struct COUNTER {

@@ -61,7 +61,7 @@ void empty_unreached_spins(FUNINFO* f) {
         if (!spins_on_itself(bb)) continue;
         const EDGE* e = bb->predecessors;
         const BBLK* pred = e->first == bb ? e->rest->first : e->first;
-        if (!pred->successors || pred->successors->rest || pred->successors->first != bb) continue;
+        if (only_block(pred->successors) != bb) continue;
         const NODE* last_real = nullptr;
         for (const LIST* s = pred->statements; s; s = s->rest) {
             if (s->first->op == BRANCH && s != pred->statements) {

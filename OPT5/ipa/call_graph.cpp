@@ -124,14 +124,8 @@ void check_program_mode() {
     no_outside_writers = no_outside_callers = 0;
 }
 
-bool assembly_names(const FUNINFO* f) {
-    for (const std::string& text : program.assembly)
-        if (text.find(f->symbol->name) != std::string::npos) return true;
-    return false;
-}
-
 void settle_root(FUNINFO* f) {
-    if (!program.assembly.empty() && assembly_names(f)) set_flags(f, FUN_is_cg_root | FUN_cannot_suppress);
+    if (assembly_names(f->symbol)) set_flags(f, FUN_is_cg_root | FUN_cannot_suppress);
     if (!no_outside_callers && TEST_FLAG(f, FUN_is_extern | FUN_is_anonymous)) set_flags(f, FUN_is_cg_root);
     const bool returns_void = f->symbol->type->return_type()->is_void();
     const bool is_special = fun_is_cpp_constructor(f) || fun_is_cpp_destructor(f);

@@ -17,6 +17,7 @@
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 
+#include <algorithm>
 #include <cstring>
 
 namespace {
@@ -52,14 +53,12 @@ void rescan_symbol_uses(NODE* tree) {
     });
 }
 
-// Assembly text may use what it names as it likes.
-bool assembly_names(const SYMTAB* sym) {
-    for (const std::string& text : program.assembly)
-        if (text.find(sym->name) != std::string::npos) return true;
-    return false;
-}
-
 } // namespace
+
+bool assembly_names(const SYMTAB* sym) {
+    return std::any_of(program.assembly.begin(), program.assembly.end(),
+                       [sym](const std::string& text) { return text.find(sym->name) != std::string::npos; });
+}
 
 void rescan_uses() {
     for (SYMTAB* s = global_symbols; s; s = s->next)

@@ -76,4 +76,5 @@ void make_symbol_groupable(SYMTAB* sym);
 
 // ---- Questions
 PRAGMA* symbol_has_pragma(const SYMTAB* sym, int kind);
+bool assembly_names(const SYMTAB* sym); // a text of the file, which may use what it names as it likes
 bool symbol_is_preemptible(const SYMTAB* sym);

@@ -140,16 +140,9 @@ bool may_keep_control(const NODE* statement) {
     });
 }
 
-bool has_cycle() {
-    need(fact::block_numbers);
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const EDGE* e = bb->successors; e; e = e->rest)
-            if (e->first->dfn <= bb->dfn) return true;
-    return false;
-}
-
 bool all_cycles_end() {
-    if (!has_cycle()) return true;
+    need(fact::block_numbers);
+    if (!any_edge_leads_back()) return true;
     need(fact::loops | fact::alias_marks);
     const NATURAL_LOOPS& loops = *currfuninfo->loops;
     const auto& list = loops.inner_first();

@@ -74,6 +74,8 @@ EDGE* edge_memberp(const BBLK* bb, EDGE* list);
 // Whether control may pass from one to the other, told by the shorter of the two lists.
 bool is_edge(const BBLK* from, const BBLK* to);
 int edge_length(const EDGE* list);
+bool any_edge_leads_back(); // of the current function, to a block of the same number or a lower one: any cycle has one
+inline BBLK* only_block(const EDGE* list) { return list && !list->rest ? list->first : nullptr; } // null: none, or several
 EDGE* rev_edge_list(EDGE* list);
 EDGE* sort_edge_list(EDGE* list);
 EDGE* fast_sort_edge_list(EDGE* list);

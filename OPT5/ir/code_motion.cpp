@@ -201,9 +201,6 @@ std::vector<CANDIDATES> VALUE_LIFE::live_at_end(const MOTION_GRAPH& graph) const
 
 namespace {
 
-bool is_only_successor(const BBLK* from) { return from->successors && !from->successors->rest; }
-bool is_only_predecessor(const BBLK* to) { return to->predecessors && !to->predecessors->rest; }
-
 LIST** start_of_body(BBLK* bb) {
     LIST** link = &bb->statements;
     while (*link && (*link)->first && (*link)->first->op == SSA_PHI) link = &(*link)->rest;
@@ -214,7 +211,7 @@ LIST** start_of_body(BBLK* bb) {
 
 bool EDGE_STATEMENTS::may_insert(BBLK* from, BBLK* to) {
     if (from->is_in_LIR_form() || tree_is_EH_SWITCH(from->branch())) return false;
-    return is_only_successor(from) || is_only_predecessor(to) || !ends_in_promise(from);
+    return only_block(from->successors) || only_block(to->predecessors) || !ends_in_promise(from);
 }
 
 void EDGE_STATEMENTS::add(BBLK* from, BBLK* to, NODE* statement) { all.push_back({from, to, statement}); }
@@ -232,9 +229,9 @@ bool EDGE_STATEMENTS::insert_useful_blocks() {
         from = e.from;
         to = e.to;
         if (!is_same_edge) middle = nullptr;
-        if (!middle && is_only_successor(e.from)) {
+        if (!middle && only_block(e.from->successors)) {
             insert_at_end_of_body(e.from, e.statement);
-        } else if (!middle && is_only_predecessor(e.to)) {
+        } else if (!middle && only_block(e.to->predecessors)) {
             LIST** link = start_of_body(e.to);
             insert_before(link, e.statement, (*link)->psn);
         } else {

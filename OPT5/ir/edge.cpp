@@ -48,6 +48,13 @@ int edge_length(const EDGE* list) {
     return n;
 }
 
+bool any_edge_leads_back() {
+    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
+        for (const EDGE* e = bb->successors; e; e = e->rest)
+            if (e->first->dfn <= bb->dfn) return true;
+    return false;
+}
+
 EDGE* rev_edge_list(EDGE* list) {
     EDGE* out = nullptr;
     while (list) {

@@ -1,6 +1,6 @@
 // What the loop hierarchy tells the rooms below the one that keeps it.
 //
-// That room, OPT5/dd, installs the callbacks; it is not built yet. While one is null, a loop tells nothing of that kind.
+// That room, OPT5/dd, installs the callbacks. While one is null, a loop tells nothing of that kind.
 #pragma once
 
 #include <cstdint>

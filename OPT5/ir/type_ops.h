@@ -38,6 +38,11 @@ NODE* remove_pushed_down_casts(NODE* tree);
 NODE* insert_mandatory_casts(NODE* tree);
 NODE* fix_type_info(NODE* tree); // repairs one node in place and returns it
 TYPE* merge_qualifiers_for_STDOT(TYPE* t, const NODE* stdot);
+NODE* mk_member(NODE* object, fkMDATA* m); // object.m as a place; `object` is taken
+// A number of one part, or a pointer; no truth value.
+inline bool is_plain_number(const TYPE* t) {
+    return ((t->is_int() && !t->is_bool()) || t->is_float() || t->is_pointer()) && !t->is_complex();
+}
 bool must_preserve_STDOT(const NODE* tree);
 bool symbol_is_immutable(const SYMTAB* sym);
 bool lvalue_is_immutable(const NODE* tree);

@@ -127,6 +127,14 @@ TYPE* merge_qualifiers_for_STDOT(TYPE* t, const NODE* stdot) {
     return tp->mk_qual(t, bits & ~static_cast<unsigned>(QUAL_PACKED));
 }
 
+NODE* mk_member(NODE* object, fkMDATA* m) {
+    NODE* field = new_node(FIELD, m->type);
+    field->mk_field(1, m, object->type);
+    NODE* t = maketree(STDOT, object, field, normalized_value_type(m->type), object->ls);
+    t->type = merge_qualifiers_for_STDOT(t->type, t);
+    return t;
+}
+
 bool must_preserve_STDOT(const NODE* tree) {
     for (; tree && (tree->op == STDOT || tree->op == STREF); tree = tree->left) {
         const fkMDATA* m = tree->right ? tree->right->mval : nullptr;

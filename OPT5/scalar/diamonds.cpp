@@ -100,10 +100,6 @@ NODE* sole_return(const BBLK* arm) {
     return is_plain_arm(s->first->right) ? s->first : nullptr;
 }
 
-BBLK* sole_successor(const BBLK* bb) {
-    return bb->successors && !bb->successors->rest ? bb->successors->first : nullptr;
-}
-
 void drop_arm(BBLK* bb, BBLK* arm) {
     disconnect(bb, arm);
     while (arm->successors) disconnect(arm, arm->successors->first);
@@ -121,8 +117,8 @@ void replace_test(BBLK* bb, LIST* test, NODE* statement, BBLK* join) {
 
 bool join_assignments(BBLK* bb, LIST* test, BBLK* on_true, BBLK* on_false) {
     NODE *a = sole_plain_assignment(on_true), *b = sole_plain_assignment(on_false);
-    BBLK* join = sole_successor(on_true);
-    if (!a || !b || !join || join != sole_successor(on_false) || join == on_true || join == on_false) return false;
+    BBLK* join = only_block(on_true->successors);
+    if (!a || !b || !join || join != only_block(on_false->successors) || join == on_true || join == on_false) return false;
     if (!trees_are_congruent(a->left, b->left, false)) return false;
     NODE* value = make_select(test->first->left, a->right, b->right, a->left->type);
     NODE* statement = mk_ASG(copy_tree(a->left), value);
@@ -155,7 +151,7 @@ NODE* make_absolute_value(const NODE* c, const NODE* a, const NODE* b, TYPE* typ
 // `if (a < x) x = a;` and `if (x < 0) x = -x;`: one arm is empty, which pays where the target has the instruction. The
 // condition computes what an extremum chooses from.
 bool join_extremum(BBLK* bb, LIST* test, BBLK* arm, BBLK* join, bool holds) {
-    if (!arm || arm == join || sole_successor(arm) != join) return false;
+    if (!arm || arm == join || only_block(arm->successors) != join) return false;
     NODE* asg = sole_assignment(arm);
     if (!asg) return false;
     NODE* condition = test->first->left;
@@ -202,7 +198,7 @@ bool find_lone_arm(const BBLK* bb, LONE_ARM* arm) {
     const NODE* targets = test->first->right;
     for (bool holds : {true, false}) {
         BBLK *block = arm_of(holds ? targets->left : targets->right, bb), *join = (holds ? targets->right : targets->left)->lbl->bblock;
-        if (!block || block == join || sole_successor(block) != join) continue;
+        if (!block || block == join || only_block(block->successors) != join) continue;
         NODE* asg = sole_plain_assignment(block);
         if (!asg || !may_be_arm_of_select(asg)) return false;
         *arm = {block, join, asg, holds};
@@ -216,7 +212,7 @@ bool are_two_arms(const BBLK* bb) {
     if (!test) return false;
     const NODE* targets = test->first->right;
     const BBLK *a = arm_of(targets->left, bb), *b = arm_of(targets->right, bb);
-    if (!a || !b || a == b || !sole_successor(a) || sole_successor(a) != sole_successor(b)) return false;
+    if (!a || !b || a == b || !only_block(a->successors) || only_block(a->successors) != only_block(b->successors)) return false;
     const NODE *x = sole_plain_assignment(a), *y = sole_plain_assignment(b);
     return x && y && trees_are_congruent(x->left, y->left, false);
 }

@@ -201,9 +201,9 @@ std::optional<bool> TEST_OUTCOMES::on_edge(const BBLK* pred, const BBLK* bb) {
             }
         } else if (t->op != BRANCH && t->op != SWITCH)
             return std::nullopt;
-        if (!pred->predecessors || pred->predecessors->rest) return std::nullopt;
         bb = pred;
-        pred = pred->predecessors->first;
+        pred = only_block(bb->predecessors);
+        if (!pred) return std::nullopt;
     }
     return std::nullopt;
 }
@@ -220,7 +220,7 @@ namespace {
 
 // The assignment of a block behind `test` alone that assigns one cheap value and then jumps to `join`, or null.
 const NODE* arm_of_select(const BBLK* arm, const BBLK* test, const BBLK* join) {
-    if (!arm->predecessors || arm->predecessors->rest || arm->predecessors->first != test) return nullptr;
+    if (only_block(arm->predecessors) != test) return nullptr;
     const LIST* s = arm->statements;
     if (!s->rest || s->rest->rest || s->rest->first->op != BRANCH || s->rest->first->left->lbl->bblock != join)
         return nullptr;

@@ -264,23 +264,22 @@ bool names(const BBLK* bb, const SYMTAB* p) {
     return false;
 }
 
-const BBLK* only(const EDGE* list) { return list && !list->rest ? list->first : nullptr; }
 bool has_two(const EDGE* list) { return list && list->rest && !list->rest->rest; }
 
 // The block from which control comes to this one whatever a branch in between decides, which does not concern p.
 BBLK* INCREMENTS::block_in_front(const BBLK* bb, const SYMTAB* p) {
-    if (BBLK* front = bb->predecessors && !bb->predecessors->rest ? bb->predecessors->first : nullptr)
-        return front->dfn < bb->dfn && only(front->successors) == bb ? front : nullptr;
+    if (BBLK* front = only_block(bb->predecessors))
+        return front->dfn < bb->dfn && only_block(front->successors) == bb ? front : nullptr;
     if (!has_two(bb->predecessors)) return nullptr;
     BBLK *a = bb->predecessors->first, *b = bb->predecessors->rest->first;
     if (a->dfn > b->dfn) std::swap(a, b);
-    if (b->dfn >= bb->dfn || only(b->successors) != bb || names(b, p)) return nullptr;
+    if (b->dfn >= bb->dfn || only_block(b->successors) != bb || names(b, p)) return nullptr;
     BBLK* front = a;
-    if (only(a->successors) == bb) { // if-else
-        if (names(a, p) || !only(a->predecessors) || only(a->predecessors) != only(b->predecessors)) return nullptr;
+    if (only_block(a->successors) == bb) { // if-else
+        if (names(a, p) || !only_block(a->predecessors) || only_block(a->predecessors) != only_block(b->predecessors)) return nullptr;
         front = a->predecessors->first;
         if (front->dfn >= a->dfn || !has_two(front->successors)) return nullptr;
-    } else if (only(b->predecessors) != a || !has_two(a->successors))
+    } else if (only_block(b->predecessors) != a || !has_two(a->successors))
         return nullptr;
     return front->branch() && front->branch()->op == IF ? front : nullptr;
 }
@@ -532,10 +531,9 @@ bool concerns_test_alone(const BBLK* bb, const LIST* cell, const SYMTAB* p) {
 
 int mentions_of(const SYMTAB* sym) {
     int count = 0;
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            for_each_subtree(static_cast<const NODE*>(s->first),
-                             [&](const NODE* n) { count += n->op == NAME && n->u.sym == sym; });
+    for_each_tree(currfuninfo, [&](const NODE* tree) {
+        for_each_subtree(tree, [&](const NODE* n) { count += n->op == NAME && n->u.sym == sym; });
+    });
     return count;
 }
 
@@ -543,7 +541,7 @@ int mentions_of(const SYMTAB* sym) {
 NODE* setting_of_limit(const BBLK* preheader, const SYMTAB* limit) {
     NODE* setting = nullptr;
     for (const LIST* s = preheader->statements; s; s = s->rest)
-        if (s->first->op == ASG && s->first->left->op == NAME && s->first->left->u.sym == limit) setting = s->first;
+        if (assigned_variable(s->first) == limit && s->first->op == ASG) setting = s->first;
     return setting && setting->right->type->is_pointer() && mentions_of(limit) == 2 ? setting : nullptr;
 }
 
@@ -629,7 +627,7 @@ bool INCREMENTS::moves_around(BBLK* latch, LIST* cell, const STEP& step) {
     need(fact::loops);
     const NATURAL_LOOPS& loops = *currfuninfo->loops;
     const NATURAL_LOOP* loop = loops.around(header);
-    if (!loop || loop->header != header || preheader == latch || only(preheader->successors) != header) return false;
+    if (!loop || loop->header != header || preheader == latch || only_block(preheader->successors) != header) return false;
     if (loops.contains(loop, exit) || loops.contains(loop, preheader)) return false;
     if (exit->predecessors->rest && split_exits >= MOST_SPLIT_EXITS) return false;
     BBLK* end = nullptr;

@@ -48,17 +48,9 @@ void prop_asg_into_if(BBLK* bb) {
 
 namespace {
 
-// An edge against the order of the blocks is what any loop has.
-bool has_backward_edge() {
-    for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (const EDGE* e = bb->successors; e; e = e->rest)
-            if (e->first->dfn <= bb->dfn) return true;
-    return false;
-}
-
 void count_loops_around_blocks() {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) bb->depth = 0;
-    if (!has_backward_edge()) return;
+    if (!any_edge_leads_back()) return;
     need(fact::loops);
     const NATURAL_LOOPS& loops = *currfuninfo->loops;
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)

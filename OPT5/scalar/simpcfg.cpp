@@ -253,12 +253,10 @@ private:
     }
 
     BBLK* mergeable_successor(BBLK* bb) {
-        if (control_of(bb)->first->op != BRANCH || !bb->successors || bb->successors->rest || bb->is_in_LIR_form())
-            return nullptr;
-        BBLK* next = bb->successors->first;
+        BBLK* next = only_block(bb->successors);
+        if (!next || control_of(bb)->first->op != BRANCH || bb->is_in_LIR_form()) return nullptr;
         if (next == bb || next == currfuninfo->bb_list || next->is_in_LIR_form()) return nullptr;
-        if (!next->predecessors || next->predecessors->rest) return nullptr;
-        return next;
+        return only_block(next->predecessors) ? next : nullptr;
     }
 
     // The BRANCH's cell becomes the first of the successor's statements.

@@ -319,26 +319,19 @@ uint64_t bits_needed(const OVERLAP* record) {
 
 // ---- References
 
-NODE* member_of(const NODE* object, fkMDATA* m) {
-    NODE* field = new_node(FIELD, m->type);
-    field->mk_field(1, m, object->type);
-    NODE* t = maketree(STDOT, copy_tree(object), field, normalized_value_type(m->type), object->ls);
-    return t;
-}
-
 // `at`, of the union of `record`, is consumed.
 void SHARING::find_places(const OVERLAP* record, NODE* at, uint64_t offset) {
     fkMDATA* part = at->type->real->mdata();
     for (const OVERLAP* child : children_in_order(record)) {
-        NODE* structure = member_of(at, part);
+        NODE* structure = mk_member(copy_tree(at), part);
         part = part->next;
         fkMDATA* m = structure->type->real->mdata();
         for (SYMTAB* s : child->vars) {
             shared.push_back(s);
-            places[s] = {member_of(structure, m), offset + static_cast<uint64_t>(m->offset)};
+            places[s] = {mk_member(copy_tree(structure), m), offset + static_cast<uint64_t>(m->offset)};
             m = m->next;
         }
-        if (child->first_child) find_places(child, member_of(structure, m), offset + static_cast<uint64_t>(m->offset));
+        if (child->first_child) find_places(child, mk_member(copy_tree(structure), m), offset + static_cast<uint64_t>(m->offset));
         erase_tree(structure);
     }
     erase_tree(at);

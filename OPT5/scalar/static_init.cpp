@@ -116,9 +116,8 @@ private:
 
     // The block that is entered next, and from here alone.
     static BBLK* only_way(const BBLK* bb) {
-        const EDGE* e = bb->successors;
-        if (!e || e->rest || e->first == currfuninfo->exit_bb) return nullptr;
-        return edge_length(e->first->predecessors) == 1 ? e->first : nullptr;
+        BBLK* next = only_block(bb->successors);
+        return next && next != currfuninfo->exit_bb && only_block(next->predecessors) ? next : nullptr;
     }
 
     static bool may_be_given_a_value(const SYMTAB* s) {

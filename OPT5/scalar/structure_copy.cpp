@@ -7,14 +7,6 @@
 
 namespace {
 
-NODE* member_of(const NODE* object, fkMDATA* m) {
-    NODE* field = new_node(FIELD, m->type);
-    field->mk_field(1, m, object->type);
-    NODE* t = maketree(STDOT, copy_tree(object), field, normalized_value_type(m->type), object->ls);
-    t->type = merge_qualifiers_for_STDOT(t->type, t);
-    return t;
-}
-
 // Whether a pointer has the same value whatever is stored through it: no memory is read for it.
 bool is_steady_pointer(const NODE* t) {
     switch (t->op) {
@@ -43,7 +35,7 @@ bool is_steady_place(const NODE* t) {
 void copy_by_members(const NODE* to, const NODE* from, std::vector<NODE*>* copies) {
     for (fkMDATA* m = to->type->real->mdata(); m; m = m->next) {
         if (m->is_bitfld && m->width == 0) continue;
-        NODE *target = member_of(to, m), *value = member_of(from, m);
+        NODE *target = mk_member(copy_tree(to), m), *value = mk_member(copy_tree(from), m);
         if (m->type->is_csu()) {
             copy_by_members(target, value, copies);
             erase_tree(target);

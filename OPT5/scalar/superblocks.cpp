@@ -21,11 +21,6 @@ register_option pass_disable_superblock_opt("disable:superblock_opt");
 
 namespace {
 
-BBLK* only_predecessor(const BBLK* bb) {
-    const EDGE* e = bb->predecessors;
-    return e && !e->rest ? e->first : nullptr;
-}
-
 // A block joins the chain of its only predecessor if that is the chain's last block. Predecessors come first in the
 // order of the graph.
 std::vector<std::unique_ptr<SBLK>> form_superblocks() {
@@ -33,7 +28,7 @@ std::vector<std::unique_ptr<SBLK>> form_superblocks() {
     SBLK::next_number = 1;
     SIDE_TABLE<SBLK*> chain_of; // null: not looked at yet
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-        const BBLK* before = only_predecessor(bb);
+        const BBLK* before = only_block(bb->predecessors);
         SBLK* chain = before ? chain_of[before] : nullptr;
         if (chain && chain->tail == before) {
             chain->add_basic_block(bb);

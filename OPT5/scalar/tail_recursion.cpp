@@ -95,7 +95,7 @@ public:
 
 private:
     static bool leads_only_to_exit(const BBLK* bb) {
-        const BBLK* to = bb->successors && !bb->successors->rest ? bb->successors->first : nullptr;
+        const BBLK* to = only_block(bb->successors);
         for (int steps = 0; to && to != currfuninfo->exit_bb; ++steps) {
             const LIST* only = to->statements;
             if (steps == 8 || !only || only->rest || only->first->op != BRANCH) return false;

@@ -9,9 +9,8 @@ namespace {
 constexpr int MOST_PURE_NODES = 48, MOST_NODES = 32, MOST_TERMS = 8;
 
 bool is_number(const TYPE* t) { return has_value_range(t) || t->is_pointer(); }
-bool is_plain_integer(const TYPE* t) { return has_value_range(t) && !t->is_bool() && !t->is_enum(); }
 bool same_form(const TYPE* a, const TYPE* b) {
-    return is_plain_integer(a) && is_plain_integer(b) && a->size == b->size && wraps_signed(a) == wraps_signed(b);
+    return is_integer_with_range(a) && is_integer_with_range(b) && a->size == b->size && wraps_signed(a) == wraps_signed(b);
 }
 
 // Opens what wraps no earlier than the sum does, or is exact by the bounds.
@@ -41,7 +40,7 @@ private:
         return operand->type->is_pointer() ? t->type->size == operand->type->size : same_form(operand->type, t->type);
     }
     bool keeps_sum(const NODE* t, bool wraps_late) const {
-        return wraps_late || (is_plain_integer(t->type) && operation_is_exact(t, loop));
+        return wraps_late || (is_integer_with_range(t->type) && operation_is_exact(t, loop));
     }
     // A cast's value is its operand's modulo the width of its type.
     bool opens_cast(const NODE* t, bool wraps_late) const {

@@ -4,6 +4,7 @@
 #include "OPT5/ir/node.h"
 
 #include <algorithm>
+#include <utility>
 
 struct LOOP;
 
@@ -27,10 +28,26 @@ inline RANGE both(const RANGE& a, const RANGE& b) {
 WIDE to_wide(INT65 v);
 INT65 to_int65(WIDE v); // of a value in its range
 
+// Of numbers without bounds: the greatest common divisor, which is not negative, and quotients by a b above 0.
+inline WIDE gcd_of(WIDE a, WIDE b) {
+    if (a < 0) a = -a;
+    if (b < 0) b = -b;
+    if (a == 1 || b == 1) return 1;
+    while (b) std::swap(a %= b, b);
+    return a;
+}
+inline WIDE floor_div(WIDE a, WIDE b) {
+    if (b == 1) return a;
+    return a >= 0 ? a / b : -((-a + b - 1) / b);
+}
+inline WIDE ceil_div(WIDE a, WIDE b) { return -floor_div(-a, b); }
+
 // An integer or enumeration of 1 to 64 bits; `wchar_t` has no known sign.
 inline bool has_value_range(const TYPE* t) {
     return (t->is_int() || t->is_enum()) && !t->is_wchar() && t->size >= 1 && t->size <= 64;
 }
+// Of those an integer: no enumeration, no truth value.
+inline bool is_integer_with_range(const TYPE* t) { return has_value_range(t) && !t->is_enum() && !t->is_bool(); }
 inline bool wraps_signed(const TYPE* t) { return !t->is_bool() && !t->is_unsigned(); } // of such a type
 // The values that a variable of the type can have. An enumeration may hold values of either sign.
 inline RANGE range_of_type(const TYPE* t) {

@@ -11,14 +11,6 @@ namespace {
 constexpr uint64_t SMALL_STRUCTURE = 32; // bits
 constexpr int MOST_MEMBERS = 2;
 
-NODE* member_of(NODE* object, fkMDATA* m) {
-    NODE* field = new_node(FIELD, m->type);
-    field->mk_field(1, m, object->type);
-    NODE* t = maketree(STDOT, object, field, normalized_value_type(m->type), object->ls);
-    t->type = merge_qualifiers_for_STDOT(t->type, t);
-    return t;
-}
-
 bool is_const_object(const NODE* t) {
     return t->op == NAME && t->u.sym && t->u.sym->type->is_const() && !lvalue_is_volatile(t) && t->type->is_csu() &&
            !t->type->is_union();
@@ -60,7 +52,7 @@ bool is_small_constant_STASG(const NODE* tree) {
 NODE* convert_STASG_to_asgs(NODE* tree) {
     NODE *to = tree->left, *from = tree->right, *assignments = nullptr;
     for (fkMDATA* m = from->type->mdata(); m; m = m->next) {
-        NODE *target = member_of(copy_tree(to), m), *value = member_of(copy_tree(from), m);
+        NODE *target = mk_member(copy_tree(to), m), *value = mk_member(copy_tree(from), m);
         assignments = mk_COMMAOP(assignments, mk_ASG(target, value));
     }
     erase_tree(tree);

@@ -14,7 +14,6 @@
 // induction counts the updates. Without a bound T there is no cap.
 #include "OPT5/vp/vp.h"
 
-#include "OPT5/alias/alias.h"
 #include "OPT5/alias/effects.h"
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/bblk.h"

@@ -38,6 +38,7 @@ bool find_tracked_symbols(VP_QUESTION question); // false: none, and there is no
 // address taken. The tree is consumed; sets `vp_changed` where something became simpler.
 NODE* prop_values_in_tree(NODE* tree, vpenv env, bool lvalue, BBLK* bb);
 extern bool vp_changed;
+NODE* comparison(int op, SYMTAB* sym, WIDE value); // of the variable with the number, in the variable's type
 // The predicates that say what is known of the symbol, in new trees; `extra` is joined to the set if it is not null.
 std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extra, SYMTAB* sym);
 

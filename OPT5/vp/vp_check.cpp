@@ -14,13 +14,6 @@ namespace {
 
 register_option pass_debug_vp_asserts("debug:vp_asserts");
 
-NODE* comparison(int op, SYMTAB* sym, WIDE value) {
-    TYPE* type = sym->type->stqs();
-    return maketree(op, mk_NAME(sym), mk_ICON(to_int65(value), type), tp->int_t);
-}
-
-bool is_integer(const TYPE* t) { return has_value_range(t) && !t->is_enum() && !t->is_bool(); }
-
 // One of the slices holds the symbol's value.
 NODE* membership(const vpset& set, SYMTAB* sym) {
     NODE* any = nullptr;
@@ -46,7 +39,7 @@ bool values_are_asserted() { return static_cast<bool>(pass_debug_vp_asserts); }
 void assert_bindings(BBLK* bb, vpenv env) {
     vpenv_store->for_each_binding(env, [&](int number, const vpset& set) {
         SYMTAB* sym = vpenv_store->symbol(number);
-        if (!is_integer(sym->type)) return;
+        if (!is_integer_with_range(sym->type)) return;
         insert_before(&bb->statements, maketree(NASSERT, membership(set, sym), nullptr, tp->int_t), nullptr);
         currfuninfo->has_nasserts = true;
     });
@@ -57,7 +50,7 @@ void assert_values_on_entry(FUNINFO* f, SYMTAB* sym, const vpset& set, const NOD
     NODE* fact = nullptr;
     if (value && !value->type->is_float() && sym->type->is_scalar() && !sym->type->is_float())
         fact = maketree(EQ, mk_NAME(sym), coerce_to_type(sym->type->stqs(), copy_tree(value)), tp->int_t);
-    else if (!value && !vpset_is_empty(set) && is_integer(sym->type))
+    else if (!value && !vpset_is_empty(set) && is_integer_with_range(sym->type))
         fact = membership(set, sym);
     if (!fact) return;
     insert_behind(prolog, maketree(NASSERT, fact, nullptr, tp->int_t), prolog->psn);

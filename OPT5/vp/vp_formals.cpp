@@ -6,6 +6,7 @@
 #include "UTIL/abort.h"
 
 #include <algorithm>
+#include <cstdio>
 #include <map>
 
 namespace {

@@ -13,7 +13,6 @@
 
 #include "OPT5/alias/effects.h"
 #include "OPT5/dd/loop.h"
-#include "OPT5/ir/facts.h"
 #include "OPT5/ir/global.h"
 #include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
@@ -27,8 +26,6 @@
 bool vp_changed = false;
 
 namespace {
-
-bool is_integer(const TYPE* t) { return has_value_range(t) && !t->is_enum() && !t->is_bool(); }
 
 // A part whose operands are not values: what it says would change with them.
 bool is_left_alone(const NODE* t) {
@@ -99,7 +96,7 @@ private:
             return t;
         // Of pointers the null pointer alone is a constant; an access through it stays what it is.
         const bool is_null = t->type->is_pointer() && known->holds(0) && !pointerContext;
-        if ((!is_integer(t->type) && !is_null) || !rewrite_is_allowed(t)) return t;
+        if ((!is_integer_with_range(t->type) && !is_null) || !rewrite_is_allowed(t)) return t;
         NODE* value = is_null ? coerce_to_type(t->type->stqs(), mk_ICON(INT65(0), tp->int_t))
                               : mk_ICON(to_int65(vpset_minimum(*known)), t->type->stqs());
         erase_node(t);
@@ -114,7 +111,7 @@ private:
         if (op_transfers_control(t->op)) return t;
         if (changed) return simp_node(t, nullptr);
         if (op_is_int_compare(t->op) || (t->op == QUEST && t->right->op == COLON)) t = decided(t);
-        if (t->op == MOD && is_integer(t->type)) t = remainder(t);
+        if (t->op == MOD && is_integer_with_range(t->type)) t = remainder(t);
         if (t->op == ICALL || t->op == QUEST) t = sum_of_alternatives(t);
         if (!depends_on_bounds(t->op)) return t;
         const int op = t->op;
@@ -199,7 +196,7 @@ private:
     // (x + c) % d, where that is x + c or one turn less.
     NODE* stepped_remainder(NODE* t, WIDE d) {
         NODE *sum = t->left, *x = sum->left;
-        if (sum->op != PLUS || sum->right->op != ICON || x->op != NAME || !is_integer(sum->type) ||
+        if (sum->op != PLUS || sum->right->op != ICON || x->op != NAME || !is_integer_with_range(sum->type) ||
             sum->type->size != t->type->size || x->type->size != sum->type->size || power_of_2(to_int65(d)) >= 0)
             return t;
         const WIDE c = to_wide(truncate_to_type(sum->right->u.lval, sum->type->stqs()));
@@ -233,7 +230,7 @@ private:
         NODE* on_false = is_strict ? arg_list_lookup(t->left, 2) : t->right->right;
         if (test->op == NEQ) std::swap(on_true, on_false);
         if ((test->op != EQ && test->op != NEQ) || test->right->op != ICON || on_true->op != ICON || on_false->op != ICON ||
-            tree_has_side_effects(test) || !is_integer(test->left->type) || !is_integer(t->type) ||
+            tree_has_side_effects(test) || !is_integer_with_range(test->left->type) || !is_integer_with_range(t->type) ||
             test->left->type->size != t->type->size || is_signed(test->left->type) != is_signed(t->type))
             return t;
         auto value = [](const NODE* c, const TYPE* type) {
@@ -263,11 +260,6 @@ private:
     bool changed = false;  // a part of it has changed
 };
 
-NODE* comparison(int op, SYMTAB* sym, WIDE value) {
-    TYPE* type = sym->type->stqs();
-    return maketree(op, mk_NAME(sym), mk_ICON(to_int65(value), type), tp->int_t);
-}
-
 // Where a loop's control variable is tested or updated, or a promise has decided whether a loop is entered, the hierarchy
 // has the statement in mind.
 const SYMTAB* symbol_kept_in(const NODE* statement, const BBLK* bb) {
@@ -287,22 +279,33 @@ bool is_left_to_hierarchy(const NODE* statement, const BBLK* bb) {
 
 // ---- Powers of two
 
-// Whether a remainder is taken by the variable.
-bool is_divisor(const SYMTAB* sym) {
-    bool divides = false;
-    for (const BBLK* bb = currfuninfo->bb_list; bb && !divides; bb = bb->dflink)
-        for (const LIST* s = bb->statements; s && !divides; s = s->rest)
-            divides = any_subtree(s->first, [sym](const NODE* t) { return t->op == MOD && t->right->op == NAME && t->right->u.sym == sym; });
-    return divides;
-}
+// The variables that a remainder is taken by; found when they are first asked for.
+class DIVISORS {
+public:
+    bool contain(SYMTAB* sym) {
+        if (!are_known)
+            for_each_tree(currfuninfo, [this](const NODE* tree) {
+                for_each_subtree(tree, [this](const NODE* t) {
+                    if (t->op == MOD && t->right->op == NAME) found.insert(t->right->u.sym);
+                });
+            });
+        are_known = true;
+        return found.count(sym) != 0;
+    }
 
-bool gives_power_of_2(const NODE* t, vpenv env, struct LOOP* loop) {
-    if (t->op != ASG || !is_private_name(t->left) || t->right->op == ICON || !is_integer(t->left->type) ||
+private:
+    SYM_SET found;
+    bool are_known = false;
+};
+
+bool gives_power_of_2(const NODE* t, vpenv env, struct LOOP* loop, DIVISORS& divisors) {
+    if (t->op != ASG || !is_private_name(t->left) || t->right->op == ICON || !is_integer_with_range(t->left->type) ||
         !positive_tree_is_power_of_2(t->right, loop) || vpenv_store->number_of(t->left->u.sym) < 0)
         return false;
     const vpset s = vpset_of_tree(t->right, env);
     const RANGE limits = range_of_type(t->left->type);
-    return !vpset_is_empty(s) && vpset_minimum(s) > 0 && vpset_maximum(s) <= limits.max && is_divisor(t->left->u.sym);
+    return !vpset_is_empty(s) && vpset_minimum(s) > 0 && vpset_maximum(s) <= limits.max &&
+           divisors.contain(t->left->u.sym);
 }
 
 // Behind x = e, for who has x alone: ((x - 1) & x) == 0.
@@ -321,7 +324,7 @@ bool assert_power_of_2(LIST* s) {
 }
 
 // Whether it makes assertions.
-bool rewrite_block(BBLK* bb, vpenv env) {
+bool rewrite_block(BBLK* bb, vpenv env, DIVISORS& divisors) {
     SYM_SET powers_of_2; // by the statements so far
     bool any = false;
     for (LIST* s = bb->statements; s; s = s->rest) {
@@ -335,7 +338,7 @@ bool rewrite_block(BBLK* bb, vpenv env) {
         }
         if (!powers_of_2.empty())
             for_each_written_name(s->first, [&](const NODE* name, const NODE*) { powers_of_2.erase(name->u.sym); });
-        if (gives_power_of_2(s->first, env, bb->loop)) {
+        if (gives_power_of_2(s->first, env, bb->loop, divisors)) {
             powers_of_2.insert(s->first->left->u.sym);
             any |= assert_power_of_2(s);
         }
@@ -346,13 +349,18 @@ bool rewrite_block(BBLK* bb, vpenv env) {
 
 } // namespace
 
+NODE* comparison(int op, SYMTAB* sym, WIDE value) {
+    TYPE* type = sym->type->stqs();
+    return maketree(op, mk_NAME(sym), mk_ICON(to_int65(value), type), tp->int_t);
+}
+
 std::vector<NODE*> list_VP_predicate_trees(const vpset& set, const VPSLICE* extra, SYMTAB* sym) {
     constexpr WIDE MANY = 1000, NEAR = 42;
     VPSLICE hull;
     vpset all = set;
     if (extra) vpset_union(&all, set, vpset(*extra));
     vpset_compress(&hull, all);
-    if (hull.is_empty() || !is_integer(sym->type)) return {};
+    if (hull.is_empty() || !is_integer_with_range(sym->type)) return {};
     if (vpslice_is_single(hull)) return {comparison(EQ, sym, hull.low)};
     const RANGE limits = range_of_type(sym->type);
     const bool is_unsigned = !wraps_signed(sym->type), has_many = vpslice_size(hull) >= MANY;
@@ -384,6 +392,7 @@ void do_value_propagation() {
     struct LOOP* const root = loop_root();
     construct_vpsets_for_cfg(root == nullptr);
     bool new_assertions = false;
+    DIVISORS divisors;
     for (BBLK* bb = currfuninfo->bb_list; bb && vpenv_store; bb = bb->dflink) {
         const vpenv* entry = bb_vpenv(bb, false);
         if (!entry) continue;
@@ -392,7 +401,7 @@ void do_value_propagation() {
             if (new_assertions) find_loop_assertions_for_loop(bb->loop);
             tell_loop_of_values(bb->loop, *entry);
         }
-        new_assertions |= rewrite_block(bb, *entry);
+        new_assertions |= rewrite_block(bb, *entry, divisors);
         if (values_are_asserted()) assert_bindings(bb, *entry);
     }
     deconstruct_vpsets_for_cfg();

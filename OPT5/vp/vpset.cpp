@@ -14,24 +14,6 @@ namespace {
 
 constexpr WIDE NO_ROOM = WIDE(1) << 70; // no end of a slice is beyond
 
-WIDE gcd(WIDE a, WIDE b) {
-    if (a < 0) a = -a;
-    if (b < 0) b = -b;
-    if (a == 1 || b == 1) return 1;
-    while (b) {
-        const WIDE r = a % b;
-        a = b;
-        b = r;
-    }
-    return a;
-}
-
-// Rounded down and up, for a divisor above 0.
-WIDE floor_div(WIDE a, WIDE b) {
-    if (b == 1) return a; // the step of most slices
-    return a >= 0 ? a / b : -((-a + b - 1) / b);
-}
-WIDE ceil_div(WIDE a, WIDE b) { return -floor_div(-a, b); }
 WIDE floor_mod(WIDE a, WIDE b) { return a - floor_div(a, b) * b; }
 
 // Ends on one grid.
@@ -47,14 +29,14 @@ bool lies_in(const VPSLICE& a, const VPSLICE& b) {
 }
 
 bool grids_meet(const VPSLICE& a, const VPSLICE& b) {
-    const WIDE g = gcd(a.step, b.step);
+    const WIDE g = gcd_of(a.step, b.step);
     return g == 0 ? a.low == b.low : (a.low - b.low) % g == 0;
 }
 
 bool overlap(const VPSLICE& a, const VPSLICE& b) { return a.low <= b.high && b.low <= a.high && grids_meet(a, b); }
 
 VPSLICE hull_of(const VPSLICE& a, const VPSLICE& b) {
-    const WIDE step = gcd(gcd(a.step, b.step), a.low - b.low);
+    const WIDE step = gcd_of(gcd_of(a.step, b.step), a.low - b.low);
     return on_grid(std::min(a.low, b.low), std::max(a.high, b.high), step);
 }
 
@@ -97,7 +79,7 @@ VPSLICE common(const VPSLICE& a, const VPSLICE& b) {
     if (!overlap(a, b)) return {};
     if (a.step == 0) return b.holds(a.low) ? a : VPSLICE{};
     if (b.step == 0) return a.holds(b.low) ? b : VPSLICE{};
-    const WIDE g = gcd(a.step, b.step), m = b.step / g, low = std::max(a.low, b.low), high = std::min(a.high, b.high);
+    const WIDE g = gcd_of(a.step, b.step), m = b.step / g, low = std::max(a.low, b.low), high = std::min(a.high, b.high);
     if (a.step > NO_ROOM / m) return slice_between(low, high, a);
     // a.low + k * a.step is congruent to b.low modulo b.step.
     const WIDE k = static_cast<WIDE>(static_cast<unsigned __int128>(floor_mod((b.low - a.low) / g, m)) *
@@ -213,12 +195,12 @@ WIDE vpset_size(const vpset& s) {
 }
 WIDE vpset_delta(const vpset& s) {
     WIDE g = 0;
-    for (const VPSLICE& slice : s) g = gcd(g, gcd(slice.step, slice.low - s[0].low));
+    for (const VPSLICE& slice : s) g = gcd_of(g, gcd_of(slice.step, slice.low - s[0].low));
     return g;
 }
 WIDE vpset_gcd(const vpset& s) {
     if (vpset_is_empty(s)) return 1;
-    return gcd(vpset_delta(s), vpset_minimum(s));
+    return gcd_of(vpset_delta(s), vpset_minimum(s));
 }
 void make_vpset_empty(vpset* s) { *s = vpset(); }
 bool vpset_is_empty(const vpset& s) { return s.size() == 0; }
@@ -368,7 +350,7 @@ void include_incr_in_vpset(WIDE incr, vpset* s, const TYPE* type) {
     const bool wraps = !type->is_pointer() && !wraps_signed(type);
     VPSLICE_LIST list;
     for (const VPSLICE& slice : *s) {
-        const WIDE step = gcd(slice.step, incr);
+        const WIDE step = gcd_of(slice.step, incr);
         const VPSLICE grid{slice.low, slice.low + step, step};
         list.push_back(slice_between(incr < 0 || wraps ? limits.min : slice.low, incr > 0 || wraps ? limits.max : slice.high, grid));
     }
@@ -390,7 +372,7 @@ bool product_of(const VPSLICE& a, const VPSLICE& b, VPSLICE* out) {
         !multiply(a.step, b.low, &step[0]) || !multiply(b.step, a.low, &step[1]) || !multiply(a.step, b.step, &step[2]))
         return false;
     *out = on_grid(*std::min_element(corner, corner + 4), *std::max_element(corner, corner + 4),
-                   gcd(gcd(step[0], step[1]), step[2]));
+                   gcd_of(gcd_of(step[0], step[1]), step[2]));
     return true;
 }
 
@@ -412,7 +394,7 @@ void by_sign(const vpset& a, const F& visit) {
 bool vpset_sum(vpset* out, const vpset& a, const vpset& b) {
     VPSLICE_LIST list;
     for (const VPSLICE& x : a)
-        for (const VPSLICE& y : b) list.push_back(on_grid(x.low + y.low, x.high + y.high, gcd(x.step, y.step)));
+        for (const VPSLICE& y : b) list.push_back(on_grid(x.low + y.low, x.high + y.high, gcd_of(x.step, y.step)));
     *out = vpset_of(list);
     return true;
 }
@@ -463,7 +445,7 @@ void vpset_remainder(vpset* out, const vpset& a, WIDE divisor) {
         if (s.high / divisor == s.low / divisor)
             r = on_grid(s.low % divisor, s.high % divisor, s.step);
         else {
-            const WIDE g = gcd(s.step, divisor);
+            const WIDE g = gcd_of(s.step, divisor);
             r = on_grid(s.low % g, divisor - g + s.low % g, g);
         }
         list.push_back(is_negative ? negative_of(r) : r);

@@ -149,6 +149,7 @@ struct EDGE_STATE {
     int from = 0, to = 0;
     vpenv env;
     bool is_passed = false;
+    bool closes_loop = false; // from within the natural loop that `to` heads
 };
 
 struct BLOCK_STATE {
@@ -157,8 +158,8 @@ struct BLOCK_STATE {
     std::vector<size_t> in, out;    // edges
     std::vector<const NODE*> origins;  // assignments x = e that the control statement tests: x is e there still
     const NODE* may_be_left = nullptr; // the statement ahead of the control statement
-    bool heads_loop = false;           // a natural one, which
-    std::vector<int> altered;          // changes these, and
+    const NATURAL_LOOP* headed = nullptr; // a natural loop, which
+    std::vector<int> altered;             // changes these, and
     bool alters_globals = false;
     THRESHOLDS thresholds; // of the loop
     std::vector<std::pair<int, vpset>> courses; // of the induction variables of the loop whose head it is
@@ -241,7 +242,7 @@ void VALUE_SETS::read_graph(bool with_loops) {
             blocks[i].out.push_back(edges.size());
             at(to).in.push_back(edges.size());
             at(to).closes_cycle |= static_cast<size_t>(to) <= i;
-            edges.push_back({static_cast<int>(i), to, {}, false});
+            edges.push_back({static_cast<int>(i), to, {}});
         }
 }
 
@@ -270,7 +271,8 @@ void VALUE_SETS::find_origins(BLOCK_STATE* b) {
     }
 }
 
-// What each natural loop changes. Its head dominates it, so that nothing else is changed where a back edge enters.
+// What each natural loop changes. Its head dominates it, so that nothing else is changed where a back edge enters. An edge
+// may lead back to the head from a cycle around it that has another entry, too: that is none of the loop.
 void VALUE_SETS::find_altered() {
     for (const BLOCK_STATE& b : blocks) {
         const NATURAL_LOOP* innermost = currfuninfo->loops->around(b.bb);
@@ -280,7 +282,7 @@ void VALUE_SETS::find_altered() {
                 add_thresholds(s->first, &compared);
         for (const NATURAL_LOOP* l = innermost; l; l = l->parent) {
             BLOCK_STATE& head = at(number_of[l->header]);
-            head.heads_loop = true;
+            head.headed = l;
             if (head.thresholds.size() < MOST_THRESHOLDS)
                 head.thresholds.insert(head.thresholds.end(), compared.begin(), compared.end());
             for (const VP_EFFECT& effect : b.effects) {
@@ -294,6 +296,7 @@ void VALUE_SETS::find_altered() {
         std::sort(b.altered.begin(), b.altered.end());
         b.altered.erase(std::unique(b.altered.begin(), b.altered.end()), b.altered.end());
         std::sort(b.thresholds.begin(), b.thresholds.end());
+        for (size_t e : b.in) edges[e].closes_loop = b.headed && currfuninfo->loops->contains(b.headed, at(edges[e].from).bb);
     }
 }
 
@@ -386,13 +389,12 @@ vpenv VALUE_SETS::capped(const BLOCK_STATE& b, vpenv env) const {
 // What the edges bring; the block has been reached. A loop that does not change a variable cannot make its set grow.
 vpenv VALUE_SETS::merged(const BLOCK_STATE& b) const {
     std::vector<vpenv> ahead, from;
-    const int number = number_of[b.bb];
     for (size_t e : b.in)
         if (edges[e].is_passed) {
             from.push_back(edges[e].env);
-            if (edges[e].from < number) ahead.push_back(edges[e].env);
+            if (!edges[e].closes_loop) ahead.push_back(edges[e].env);
         }
-    if (!b.heads_loop || ahead.empty() || ahead.size() == from.size()) return vpenv_store->join(std::move(from));
+    if (!b.headed || ahead.empty() || ahead.size() == from.size()) return vpenv_store->join(std::move(from));
     const vpenv entered = vpenv_store->join(std::move(ahead)), all = vpenv_store->join(std::move(from));
     vpenv env = all;
     vpenv_store->for_each_difference(entered, all, [&](int symbol, const vpset* set, const vpset*) {

@@ -20,6 +20,25 @@ int accumulated(void) {
     return s;
 }
 
+// The block that repeats is part of a cycle with two entries, through which another value comes to it.
+int cycle_with_two_entries(unsigned s, int a) {
+    int d = 2, fuel = 20;
+    if (a) goto repeats;
+other:
+    if (--fuel < 0) return a;
+    h += s & 7;
+    d = a + 7;
+    s = s * 75u + 74u; if (s & 256u) goto behind;
+repeats:
+    if (--fuel < 0) return a;
+    put_i16(d);
+    s = s * 75u + 74u; if (s & 256u) goto repeats;
+behind:
+    if (--fuel < 0) return a;
+    s = s * 75u + 74u; if (s & 256u) goto other;
+    return d;
+}
+
 // FUNCTION: doubled
 // HAS: /if .*s > 1000/
 int doubled(int n) {
@@ -245,6 +264,7 @@ int main(void) {
         put_i16(other(i) + cases(i));
     }
     put_i16(nested() + h);
+    put_i16(cycle_with_two_entries(19584u, 4));
     for (i = 0; i < 16; i++) a[i >> 2][i & 3] = i * 3 % 7;
     put_i16(written(40L) + by_nothing(0));
     at = x;

@@ -10,6 +10,7 @@
 // Sound because a computation is placed only where every path from there computes the expression before its operands
 // change (so that nothing is computed that was not, and nothing traps that did not; a statement that may not pass
 // control on counts as a change for what may trap), and is taken away only where all paths have it in the temporary.
+// Of a statement with effects among its reads those operands take part that none of the effects may change.
 // Edges that exceptions take, and those out of a block that ends in their dispatch, get no computation.
 //
 // What a block does to an expression is asked when some path brings the expression there, and the number of blocks that

@@ -152,8 +152,11 @@ private:
     void statement(BBLK* bb, LIST* cell, int position);
     void enter_writes(const BBLK* bb, const NODE* t, int position);
     void read(NODE*& slot, bool is_certain);
-    void read_operands(NODE* t, bool is_certain);
-    void read_place(NODE* t, bool is_certain);
+    auto reader() {
+        return [this](NODE*& slot, bool is_certain) { read(slot, is_certain); };
+    }
+    void read_operands(NODE* t, bool is_certain) { for_each_operand_read(t, is_certain, reader()); }
+    void read_place(NODE* t, bool is_certain) { for_each_read_of_place(t, is_certain, reader()); }
     KNOWN number(const NODE* t);
     KNOWN find(const NODE* t);
     KNOWN number_of_leaf(const NODE* t);
@@ -176,6 +179,7 @@ private:
     void share_PT_info_of_loads();
 
     TREE_NUMBERS numbers;
+    MIXED_READS mixed; // of the statement in work
     FLAT_MAP<const NODE*, KNOWN> known; // of the trees of one statement
     struct SITE {
         int number;
@@ -425,34 +429,13 @@ TRIPLE ANNOTATOR::new_triple(int number) {
 void ANNOTATOR::read(NODE*& slot, bool is_certain) {
     NODE* t = slot;
     if (!t || number_of_operands[t->op] == 0) return;
-    if (good_CSE_tree(t, false) && type_code(t->type)) {
+    if (good_CSE_tree(t, false) && type_code(t->type) && !mixed.is_out(t)) {
         const KNOWN k = number(t);
         if (k.number != NO_TRIPLE && k.cost > 0)
-            sites.push_back({k.number, static_cast<float>(k.cost), {block->dfn, position, &slot, block, cell, is_certain}});
+            sites.push_back({k.number, static_cast<float>(k.cost),
+                             {block->dfn, position, &slot, block, cell, is_certain && !mixed.must_stay(t)}});
     }
     read_operands(t, is_certain);
-}
-
-void ANNOTATOR::read_operands(NODE* t, bool is_certain) {
-    switch (t->op) {
-    case UAND:
-    case ARGREF:
-    case STARG:
-    case STDOT: return read_place(t->left, is_certain);
-    case STREF: return read(t->left, is_certain);
-    case ICALL:
-        if (ok_to_CSE_ICALL_opds(t)) read(t->left, is_certain);
-        return;
-    case ANDAND:
-    case OROR:
-    case QUEST: read(t->left, is_certain); return read(t->right, false);
-    default: read(t->left, is_certain); read(t->right, is_certain);
-    }
-}
-
-void ANNOTATOR::read_place(NODE* t, bool is_certain) {
-    NODE* object = without_members(t);
-    if (object->op == UMULT || object->op == STREF) read(object->left, is_certain);
 }
 
 void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
@@ -462,7 +445,10 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
     known.clear();
     NODE* t = s->first;
     enter_writes(bb, t, at);
-    if (!reads_come_first(t)) return;
+    if (!reads_come_first(t)) {
+        if (mixed.enter(t)) for_each_read_of_mixed(t, reader());
+        return mixed.clear();
+    }
     switch (t->op) {
     case RETURN: return read(t->right, true);
     case IF: // its own compare stays what the control flow is read from

@@ -46,7 +46,6 @@ namespace {
 using VALUE = int; // a value's number; 0: none
 constexpr size_t MOST_LOADS = 32, MOST_HOLDERS = 4;
 constexpr int MOST_NODES = 64; // of a tree that is worth looking for
-constexpr int MOST_MIXED_NODES = 256; // of a statement whose effects stand among its reads: each read is asked about each
 constexpr double COST_OF_ASSIGNMENT = 1;
 
 bool is_assignment_of_private_name(const NODE* t) {
@@ -265,51 +264,6 @@ VALUE NUMBERS::of_step(const NODE* asg, VALUE a, VALUE b) {
     return numbers.of({op, code, code == 1 ? 0 : code, a, b});
 }
 
-// ---- Statements whose effects stand among their reads
-
-// Assignments and calls are the effects; of other operators it is not known here what becomes of their operands.
-bool effects_are_known(const NODE* statement) {
-    return !any_subtree(statement, [statement](const NODE* t) {
-        if (t->op == CSE_ORIG || t->op == CSE_DUPE || t->op == ASM) return true;
-        if (t == statement || !op_has_effect(t->op)) return false;
-        return !writes_left_operand(t->op) && t->op != CALL && t->op != UCALL && t->op != ICALL && t->op != COMMAOP;
-    });
-}
-
-// What the statement evaluates ahead of its own effect, if that is the last one.
-std::vector<const NODE*> operands_with_effects(const NODE* t) {
-    const bool is_call = (t->op == ASG || t->op == STASG) && t->right->op == CALL; // made last
-    std::vector<const NODE*> operands{t->left};
-    if (is_call) operands.push_back(t->right->left);
-    operands.push_back(is_call ? t->right->right : t->right);
-    operands.erase(std::remove_if(operands.begin(), operands.end(),
-                                  [](const NODE* n) { return !n || !tree_has_side_effects(n); }),
-                   operands.end());
-    return operands;
-}
-
-// Calls `mark` for each operand below and with `t` that acts or that one of the effects may change. True of `t` itself.
-template <class F>
-bool mark_unCSEable_opds(const NODE* t, const std::vector<const NODE*>& effects, const F& mark) {
-    if (!t) return false;
-    const NODE *left = t->left, *right = t->right;
-    if (t->op == UAND || t->op == ARGREF || t->op == STARG || t->op == STDOT) { // the object is not read as a whole
-        left = without_members(left);
-        if (left->op == UMULT || left->op == STREF) left = left->left;
-        if (left->op == NAME) left = nullptr;
-        right = nullptr;
-    }
-    bool is_out = mark_unCSEable_opds(left, effects, mark);
-    is_out |= mark_unCSEable_opds(right, effects, mark);
-    is_out = is_out || !tree_changes_nothing(t) || std::any_of(effects.begin(), effects.end(), [t](const NODE* effect) {
-        if (op_is_call(t->op)) return tree_modifies_lvalue_in_tree(effect, t);
-        return (op_is_load(t->op) || (t->op == NAME && t->u.sym && !t->u.sym->is_function())) &&
-               tree_modifies_lvalue(effect, t);
-    });
-    if (is_out) mark(t);
-    return is_out;
-}
-
 // ---- The trees of a chain
 
 // What is known of a value: which variables have it, or where it was computed first and is computed again.
@@ -347,8 +301,11 @@ private:
     bool is_redundant(const NODE* t);
     void learn_store(const NODE* t, VALUE v);
     void read(NODE*& slot, bool is_certain);
-    void read_operands(NODE* t, bool is_certain);
-    void read_place(NODE* t, bool is_certain);
+    auto reader() {
+        return [this](NODE*& slot, bool is_certain) { read(slot, is_certain); };
+    }
+    void read_operands(NODE* t, bool is_certain) { for_each_operand_read(t, is_certain, reader()); }
+    void read_place(NODE* t, bool is_certain) { for_each_read_of_place(t, is_certain, reader()); }
     bool reuse(NODE*& slot, bool is_certain);
     bool has_quotient(const NODE* remainder);
     SYMTAB* holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type);
@@ -358,9 +315,7 @@ private:
     NUMBERS numbers;
     std::unordered_map<VALUE, OCCURRENCES> values; // looked up, never walked
     STATEMENTS_AHEAD ahead;
-    std::unordered_set<const NODE*> unCSEable; // of the statement in work; membership only
-    std::unordered_set<const SYMTAB*> written; // by operands of it; membership only
-    bool keeps_traps = false;                  // what may trap does not move ahead of it
+    MIXED_READS mixed;         // of the statement in work
     std::vector<BBLK*> blocks; // of the chain
     const BBLK* chain_end = nullptr;
     LIST* current = nullptr;
@@ -419,28 +374,8 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
 
 // The operands that keep their value throughout take part; what is assigned is not learned.
 void COMMON_SUBEXPRESSIONS::mixed_statement(NODE* t) {
-    const bool is_test = t->op == IF || t->op == SWITCH, assigns = writes_left_operand(t->op) && t->right;
-    if (!is_test && !assigns && t->op != RETURN && t->op != CALL) return;
-    if ((is_test && t->left->op == ENDLOOP) || tree_is_arg_prolog(t)) return;
-    if (count_nodes_in_tree(t) > MOST_MIXED_NODES || !effects_are_known(t)) return;
-    const std::vector<const NODE*> effects = operands_with_effects(t);
-    for (const NODE* e : effects)
-        for_each_written_name(e, [this](const NODE* name, const NODE*) { written.insert(name->u.sym); });
-    auto mark = [this](const NODE* operand) { unCSEable.insert(operand); };
-    mark_unCSEable_opds(t->left, effects, mark);
-    mark_unCSEable_opds(t->right, effects, mark);
-    keeps_traps = std::any_of(effects.begin(), effects.end(), may_leave_in_the_middle);
-    if (is_test) {
-        read_operands(t->left, true);
-    } else if (t->op == ASG && t->right->op == CALL) {
-        read_operands(t->right, true);
-        read_place(t->left, true);
-    } else {
-        read_operands(t, true);
-    }
-    unCSEable.clear();
-    written.clear();
-    keeps_traps = false;
+    if (mixed.enter(t)) for_each_read_of_mixed(t, reader());
+    mixed.clear();
 }
 
 bool COMMON_SUBEXPRESSIONS::is_redundant(const NODE* t) {
@@ -527,42 +462,12 @@ void COMMON_SUBEXPRESSIONS::learn_store(const NODE* t, VALUE v) {
 
 void COMMON_SUBEXPRESSIONS::read(NODE*& slot, bool is_certain) {
     if (!slot || (number_of_operands[slot->op] == 0 && !good_CSE_tree(slot, false))) return;
-    if (unCSEable.count(slot) || !reuse(slot, is_certain)) read_operands(slot, is_certain);
-}
-
-void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
-    if (writes_left_operand(t->op)) {
-        read_place(t->left, is_certain);
-        return read(t->right, is_certain);
-    }
-    switch (t->op) {
-    case UAND:
-    case ARGREF:
-    case STARG:
-    case STDOT: read_place(t->left, is_certain); return;
-    case ANDAND:
-    case OROR:
-    case QUEST:
-        read(t->left, is_certain);
-        read(t->right, false);
-        return;
-    case STREF: read(t->left, is_certain); return;
-    case ICALL:
-        if (ok_to_CSE_ICALL_opds(t)) read(t->left, is_certain);
-        return;
-    default: read(t->left, is_certain); read(t->right, is_certain);
-    }
-}
-
-// The place is not read here, but the pointer that it lies behind is.
-void COMMON_SUBEXPRESSIONS::read_place(NODE* t, bool is_certain) {
-    NODE* object = without_members(t);
-    if (object->op == UMULT || object->op == STREF) read(object->left, is_certain);
+    if (mixed.is_out(slot) || !reuse(slot, is_certain)) read_operands(slot, is_certain);
 }
 
 SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {
     for (auto it = known.holders.rbegin(); it != known.holders.rend(); ++it)
-        if (!written.count(*it) && numbers.of_variable(*it) == v && types_are_close_enough((*it)->type, type)) return *it;
+        if (!mixed.writes(*it) && numbers.of_variable(*it) == v && types_are_close_enough((*it)->type, type)) return *it;
     return nullptr;
 }
 
@@ -603,7 +508,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
         return true;
     }
     if (!known.first) {
-        if (!is_certain || (keeps_traps && may_trap(t))) return false;
+        if (!is_certain || mixed.must_stay(t)) return false;
         known.first = &slot;
         known.cell = current;
         known.block = blocks.size();

@@ -2,13 +2,17 @@
 #pragma once
 
 #include "BITVEC/bitvec.h"
+#include "OPT5/alias/effects.h"
 #include "OPT5/ir/flat_map.h"
 #include "OPT5/ir/list.h"
 #include "OPT5/ir/node.h"
+#include "OPT5/ir/trees.h"
+#include "OPT5/target/bif.h"
 
 #include <cstddef>
 #include <cstdint>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 class BBLK;
@@ -64,6 +68,66 @@ bool op_is_computed(int op); // an operator on values whose result they decide
 int weight_of_operator(const NODE* t);
 // All operands of the statement are evaluated ahead of its one effect, if it has one.
 bool reads_come_first(const NODE* statement);
+
+// ---- Statements whose effects stand among their reads (mixed_statements.cpp)
+
+class MIXED_READS {
+public:
+    // False of a statement that takes no part. `clear` makes it one without such effects.
+    bool enter(const NODE* statement);
+    void clear();
+    // Whether an operand acts, or an effect among the operands may change it: it stays where it is.
+    bool is_out(const NODE* operand) const { return unCSEable.count(operand) != 0; }
+    bool writes(const SYMTAB* variable) const { return written.count(variable) != 0; }
+    // May trap, and an effect may not pass control on: it is not evaluated ahead of the statement.
+    bool must_stay(const NODE* operand) const;
+
+private:
+    std::unordered_set<const NODE*> unCSEable;  // membership only
+    std::unordered_set<const SYMTAB*> written;  // likewise
+    bool keeps_traps = false;
+};
+
+// ---- What a tree reads, by slot
+
+// A place is not read where it is written or its address taken, but the pointer that it lies behind is.
+template <class F>
+void for_each_read_of_place(NODE* place, bool is_certain, const F& read) {
+    NODE* object = without_members(place);
+    if (op_is_indirection(object->op)) read(object->left, is_certain);
+}
+
+// Calls `read(slot, is_certain)` for each operand whose value is read. Certain: whenever `t` is evaluated.
+template <class F>
+void for_each_operand_read(NODE* t, bool is_certain, const F& read) {
+    if (writes_left_operand(t->op)) {
+        for_each_read_of_place(t->left, is_certain, read);
+        return read(t->right, is_certain);
+    }
+    switch (t->op) {
+    case UAND:
+    case ARGREF:
+    case STARG:
+    case STDOT: return for_each_read_of_place(t->left, is_certain, read);
+    case ANDAND:
+    case OROR:
+    case QUEST: read(t->left, is_certain); return read(t->right, false);
+    case STREF: return read(t->left, is_certain);
+    case ICALL:
+        if (ok_to_CSE_ICALL_opds(t)) read(t->left, is_certain);
+        return;
+    default: read(t->left, is_certain); read(t->right, is_certain);
+    }
+}
+
+// The same for a statement that takes part in spite of effects among its reads.
+template <class F>
+void for_each_read_of_mixed(NODE* t, const F& read) {
+    if (t->op == IF || t->op == SWITCH) return for_each_operand_read(t->left, true, read);
+    if (t->op != ASG || t->right->op != CALL) return for_each_operand_read(t, true, read);
+    for_each_operand_read(t->right, true, read);
+    for_each_read_of_place(t->left, true, read);
+}
 
 // Assignments to temporaries that are to stand ahead of statements: by the statement, in ascending order.
 struct KEPT {

@@ -49,6 +49,30 @@ int changed(int a, int b, int c) {
     return x ^ y ^ z ^ (a + b) * c;
 }
 
+// Effects among the reads that leave the operands alone: the value is there ahead of them.
+// FUNCTION: beside_effects
+// COUNT 1: b * 5 + a
+int beside_effects(int a, int b, int n, int *p) {
+    int i, k, s = 0;
+    for (i = 0; i < n; i++) {
+        *p++ = E(a, b) + i;
+        s += check(i + 1) ^ E(a, b);
+        cell = (k = check(n)) + E(a, b) + k;
+    }
+    return s;
+}
+
+// Those that change them, those that are not evaluated, and, beside a call that may not return, what may trap.
+// FUNCTION: beside_other_effects
+// HAS: /\(a \+= 1\) && \(_cell \+= .* a\)\) && _check\(b\) \+ a . b$/
+// HAS: return _check(b) + a / b
+int beside_other_effects(int a, int b, int c) {
+    if (c & 1) use(E(a, b)); else cell = E(a, b) + 1;
+    c += (E(a, b) & 4) && (a += 1) && (cell += E(a, b)) && check(b) + a / b;
+    if (c & 2) return check(b) + a / b;
+    return E(a, b);
+}
+
 // A division stays behind a call that may not return; 1: it is not computed ahead of the loop.
 // FUNCTION: divides
 // COUNT 1: n / b
@@ -213,6 +237,7 @@ unsigned stepped_once_more(short *first) {
 }
 
 int main(void) {
+    static int buffer[4];
     struct S s = {1, {2, 3, 4}}, t = {5, {6, 7, 8}};
     int c;
     gs.b[1] = 11;
@@ -236,6 +261,8 @@ int main(void) {
     tab[1] = &cell;
     put_i16(closed_by_its_test(30)); put_i16(cell);
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
+    for (c = 1; c < 7; c++) { put_i16(beside_effects(c, 3, c & 3, buffer)); put_i16(cell + buffer[0]); }
+    for (c = 1; c < 7; c++) { put_i16(beside_other_effects(c, 3, c)); put_i16(beside_other_effects(9 * c, 3, 4)); }
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));
     return 0;

@@ -19,6 +19,13 @@ bool is_pointer_in_memory(const NODE* name) {
            !(sym->cqual & (CQ_MARKS_FUNCTION | CQ_GLOBAL_REGISTER));
 }
 
+// A constant displacement belongs to the access, unless no addressing mode has room for it.
+bool displacement_is_free(const NODE* t) {
+    if (!t->type->is_pointer() || t->right->op != ICON) return false;
+    const INT65 by = t->op == PLUS ? t->right->u.lval : -t->right->u.lval;
+    return by.is_negative() || offset_is_in_range(by, t->type, 1);
+}
+
 } // namespace
 
 bool good_CSE_tree(const NODE* t, bool) {
@@ -31,8 +38,7 @@ bool good_CSE_tree(const NODE* t, bool) {
     case FCON: return false;
     case NAME: return is_pointer_in_memory(t);
     case PLUS:
-    case MINUS: // a constant displacement belongs to the access
-        return !(t->type->is_pointer() && t->right->op == ICON);
+    case MINUS: return !displacement_is_free(t);
     case UAND:
     case ARGREF: return false; // a constant, or the sum below it
     case SCONV:                // a product of two of them is the short one, which one of variables would not be

@@ -34,6 +34,7 @@
 #include "OPT5/scalar/triples.h"
 #include "OPT5/simp/seq.h"
 #include "OPT5/target/bif.h"
+#include "OPT5/target/target.h"
 
 #include <algorithm>
 #include <cmath>
@@ -47,6 +48,7 @@ using VALUE = int; // a value's number; 0: none
 constexpr size_t MOST_LOADS = 32, MOST_HOLDERS = 4;
 constexpr int MOST_NODES = 64; // of a tree that is worth looking for
 constexpr double COST_OF_ASSIGNMENT = 1;
+constexpr int MOST_GOAL_FOR_SIZE = 3;
 
 bool is_assignment_of_private_name(const NODE* t) {
     return (t->op == ASG || is_operator_assignment(t)) && is_private_name(t->left) && !tree_has_side_effects(t->right);
@@ -304,7 +306,7 @@ private:
     auto reader() {
         return [this](NODE*& slot, bool is_certain) { read(slot, is_certain); };
     }
-    void read_operands(NODE* t, bool is_certain) { for_each_operand_read(t, is_certain, reader()); }
+    void read_operands(NODE* t, bool is_certain);
     void read_place(NODE* t, bool is_certain) { for_each_read_of_place(t, is_certain, reader()); }
     bool reuse(NODE*& slot, bool is_certain);
     bool has_quotient(const NODE* remainder);
@@ -316,6 +318,7 @@ private:
     std::unordered_map<VALUE, OCCURRENCES> values; // looked up, never walked
     STATEMENTS_AHEAD ahead;
     MIXED_READS mixed;         // of the statement in work
+    std::unordered_set<const NODE*> left_in_memory; // operands of it that the multiply reads there; membership only
     std::vector<BBLK*> blocks; // of the chain
     const BBLK* chain_end = nullptr;
     LIST* current = nullptr;
@@ -353,6 +356,7 @@ void COMMON_SUBEXPRESSIONS::statement(LIST* s) {
         if ((n->op == UMULT && !n->right) || n->op == STREF) n->left = normalize_ptr_for_indexing(n->left);
     });
     numbers.begin_statement();
+    left_in_memory.clear();
     if (!reads_come_first(t)) {
         mixed_statement(t);
         numbers.forget_changed(t);
@@ -465,6 +469,16 @@ void COMMON_SUBEXPRESSIONS::read(NODE*& slot, bool is_certain) {
     if (mixed.is_out(slot) || !reuse(slot, is_certain)) read_operands(slot, is_certain);
 }
 
+// Where size counts, an operand that the multiply reads from memory gets no temporary: that would be an instruction more.
+void COMMON_SUBEXPRESSIONS::read_operands(NODE* t, bool is_certain) {
+    if (t->op == MULT && size_speed_goal() <= MOST_GOAL_FOR_SIZE) {
+        const unsigned from_memory = mpy16_memory_operands(t);
+        if (from_memory & 1) left_in_memory.insert(without_mpy16_cast(t->left));
+        if (from_memory & 2) left_in_memory.insert(without_mpy16_cast(t->right));
+    }
+    for_each_operand_read(t, is_certain, reader());
+}
+
 SYMTAB* COMMON_SUBEXPRESSIONS::holder_of(const OCCURRENCES& known, VALUE v, const TYPE* type) {
     for (auto it = known.holders.rbegin(); it != known.holders.rend(); ++it)
         if (!mixed.writes(*it) && numbers.of_variable(*it) == v && types_are_close_enough((*it)->type, type)) return *it;
@@ -507,6 +521,7 @@ bool COMMON_SUBEXPRESSIONS::reuse(NODE*& slot, bool is_certain) {
         has_changed = true;
         return true;
     }
+    if (left_in_memory.count(t)) return false;
     if (!known.first) {
         if (!is_certain || mixed.must_stay(t)) return false;
         known.first = &slot;

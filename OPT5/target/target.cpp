@@ -69,6 +69,40 @@ int init_reg_defs() {
 bool leaf_is_immediate(const NODE* t) { return t->op == ICON; }
 bool offset_is_in_range(INT65 offset, const TYPE*, int) { return !offset.is_negative() && offset <= INT65(32767); }
 
+namespace {
+
+enum MPY16_OPERAND { MEMORY, REGISTER, CONSTANT };
+constexpr struct {
+    MPY16_OPERAND left, right;
+    unsigned memory_operands;
+} mpy16_forms[] = {
+    {MEMORY, REGISTER, 1}, // the other one goes to the multiplicand register
+    {REGISTER, MEMORY, 2},
+    {MEMORY, MEMORY, 3},   // which is loaded from memory as well
+    {MEMORY, CONSTANT, 1},
+};
+
+constexpr long MPY16_BITS = 16;
+bool fits_mpy16(const TYPE* type) { return (type->is_int() || type->is_enum()) && type->size <= MPY16_BITS; }
+
+MPY16_OPERAND mpy16_operand(const NODE* t) {
+    if (t->op == ICON) return CONSTANT;
+    t = without_mpy16_cast(t);
+    const bool is_access = op_is_load(t->op) || (t->op == NAME && t->u.sym && !t->u.sym->is_automatic());
+    const bool is_field = (t->op == STDOT || t->op == STREF) && t->right->mval->is_bitfld;
+    return is_access && !is_field && fits_mpy16(t->type) && t->type->size == MPY16_BITS ? MEMORY : REGISTER;
+}
+
+} // namespace
+
+unsigned mpy16_memory_operands(const NODE* t) {
+    if (t->op != MULT || !fits_mpy16(t->type)) return 0;
+    const MPY16_OPERAND left = mpy16_operand(t->left), right = mpy16_operand(t->right);
+    for (const auto& form : mpy16_forms)
+        if (form.left == left && form.right == right) return form.memory_operands;
+    return 0;
+}
+
 NODE* cpu_bit_test_subtree(NODE* t) {
     bool is_test = t->op == EQ || t->op == NEQ || t->op == LT || t->op == GE || t->op == GT;
     if (is_test && t->right->op == ICON && t->right->u.lval.is_zero()) t = t->left;

@@ -25,6 +25,10 @@ bool reserve_global_register(const char* name);                  // false: no re
 int init_reg_defs();                                             // resets the count of stack variables; 0
 bool leaf_is_immediate(const NODE* t);
 bool offset_is_in_range(INT65 offset, const TYPE* type, int scale); // of an addressing mode: 0 to 32767
+// The operands that the 16-bit multiply reads from memory itself where it makes the product `t`: 1 the left one, 2 the right
+// one, or both; a cast of one is part of the access. 0: it does not make the product, or from registers.
+unsigned mpy16_memory_operands(const NODE* t);
+inline const NODE* without_mpy16_cast(const NODE* operand) { return operand->op == SCONV ? operand->left : operand; }
 NODE* cpu_bit_test_subtree(NODE* t);                                // what a test of one bit is made on
 long cost_for_DIV_to_MULT_expr(const NODE* t);
 

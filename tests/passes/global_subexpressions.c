@@ -73,6 +73,18 @@ int beside_other_effects(int a, int b, int c) {
     return E(a, b);
 }
 
+// A displacement that no access has room for is added once; one that it has belongs to it.
+int far[40000];
+// FUNCTION: out_of_reach
+// COUNT 1: + 35000
+// COUNT 3: + 300)
+int out_of_reach(int k) {
+    far[35000] ^= k; far[300] += k; use(k);
+    far[35000] += 2; far[300] ^= k; use(k + 1);
+    far[35000] -= k;
+    return far[300];
+}
+
 // A division stays behind a call that may not return; 1: it is not computed ahead of the loop.
 // FUNCTION: divides
 // COUNT 1: n / b
@@ -263,6 +275,7 @@ int main(void) {
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
     for (c = 1; c < 7; c++) { put_i16(beside_effects(c, 3, c & 3, buffer)); put_i16(cell + buffer[0]); }
     for (c = 1; c < 7; c++) { put_i16(beside_other_effects(c, 3, c)); put_i16(beside_other_effects(9 * c, 3, 4)); }
+    put_i16(out_of_reach(9)); put_i16(far[35000]);
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));
     return 0;

@@ -291,9 +291,15 @@ void UNROLLED_BODY::replace_body(int count, NODE* control) {
 
 // ---- The loop
 
-NODE* UNROLLED_BODY::stays_while(int op, NODE* limit) const {
+// Control stays in the loop until the control variable is at the end; consumed.
+NODE* UNROLLED_BODY::test_of_end(NODE* end) const {
+    const TYPE* type = loop->LCV->sym->type;
+    const bool is_unsigned = type->is_pointer() || type->is_unsigned();
+    const bool goes_down =
+        sign_extend_by_type_size(loop->LCV->incrtree->u.lval, loop->LCV->incrtree->type).is_negative();
+    int op = loop->test == NEQ ? NEQ : goes_down ? (is_unsigned ? UGT : GT) : (is_unsigned ? ULT : LT);
     if (!stays_if_true) op = boolean_inv[op];
-    return maketree(op, mk_NAME(loop->LCV->sym), limit, tp->int_t);
+    return maketree(op, mk_NAME(loop->LCV->sym), end, tp->int_t);
 }
 
 void UNROLLED_BODY::unroll(int factor) {
@@ -325,9 +331,9 @@ NODE* rounded_down(const NODE* trips, int factor) {
 
 } // namespace
 
-// The control variable has taken so many steps behind the last full round: it is on its course between the value on
-// entry and the one that it has at last, whatever its type; the sum is made in one that wraps.
-NODE* UNROLLED_BODY::main_loop_test(const NODE* trips, int factor) {
+// What the control variable holds behind the last full round: it is on its course between the value on entry and the
+// one that it has at last, whatever its type; the sum is made in one that wraps.
+NODE* UNROLLED_BODY::main_loop_end(const NODE* trips, int factor) {
     SYMTAB* counter = loop->LCV->sym;
     TYPE* type = counter->type->is_pointer() ? tp->long_t : counter->type->stqs();
     INT65 step = sign_extend_by_type_size(loop->LCV->incrtree->u.lval, loop->LCV->incrtree->type);
@@ -345,14 +351,10 @@ NODE* UNROLLED_BODY::main_loop_test(const NODE* trips, int factor) {
     TYPE* sum = is_pointer ? counter->type->stqs() : type;
     NODE* end = coerce_to_type(sum, maketree(goes_down ? MINUS : PLUS, start, full, is_pointer ? sum : in));
     end = normalize_tree(simp_tree(end, nullptr), nullptr);
-    if (end->op != ICON) {
-        SYMTAB* limit = sym_temp('d', -1, sum, nullptr);
-        insert_at_end_of_body(loop->preheader, mk_ASG(mk_NAME(limit), end));
-        end = mk_NAME(limit);
-    }
-    const bool is_unsigned = is_pointer || counter->type->is_unsigned();
-    const int op = loop->test == NEQ ? NEQ : goes_down ? (is_unsigned ? UGT : GT) : (is_unsigned ? ULT : LT);
-    return stays_while(op, end);
+    if (end->op == ICON) return end;
+    SYMTAB* limit = sym_temp('d', -1, sum, nullptr);
+    insert_at_end_of_body(loop->preheader, mk_ASG(mk_NAME(limit), end));
+    return mk_NAME(limit);
 }
 
 // So many copies, which control leaves to `behind`; the first block.
@@ -406,6 +408,18 @@ NODE* UNROLLED_BODY::kept_ahead(NODE* value) {
     return mk_NAME(sym);
 }
 
+// Where the counter is what is left over's alone behind the loop, pointers may take its place in the loop: a block
+// ahead of `behind` in which it gets its value anew.
+BBLK* UNROLLED_BODY::counter_at_end(const NODE* end, BBLK* behind) {
+    SYMTAB* counter = loop->LCV->sym;
+    if (!counter->type->is_int() || !step_of(counter)) return behind;
+    last = blocks.back();
+    PSN* psn = loop->tail->last_statement()->psn;
+    BBLK* made = new_block(loop->parent);
+    put(made, mkelist(mk_ASG(mk_NAME(counter), copy_tree(end)), nullptr, psn), mk_BRANCH(behind), psn);
+    return made;
+}
+
 void UNROLLED_BODY::unroll(int factor, const REST& rest) {
     NODE *trips = kept_ahead(copy_tree(rest.trips)), *over = nullptr;
     const bool is_power = (factor & (factor - 1)) == 0;
@@ -415,9 +429,10 @@ void UNROLLED_BODY::unroll(int factor, const REST& rest) {
                                               trips->type->stqs()));
     BBLK* behind = new_rest(factor, rest, over);
     if (rest.may_be_less) guard(trips, factor, behind);
-    NODE* control = copy_tree(loop->tail->branch());
+    NODE *control = copy_tree(loop->tail->branch()), *end = main_loop_end(trips, factor);
+    if (behind != exit) behind = counter_at_end(end, behind);
     erase_tree(control->left);
-    control->left = main_loop_test(trips, factor);
+    control->left = test_of_end(end);
     NODE* to_exit = stays_if_true ? control->right->right : control->right->left;
     if (behind != exit) remap_labelrefs(to_exit, to_exit->lbl, label_of_bb(behind));
     if (over) erase_tree(over);

@@ -69,8 +69,9 @@ private:
     void guard(const NODE* trips, int factor, BBLK* otherwise);
     NODE* kept_ahead(NODE* value);
     void replace_body(int count, NODE* control);
-    NODE* main_loop_test(const NODE* trips, int factor);
-    NODE* stays_while(int op, NODE* limit) const;
+    NODE* main_loop_end(const NODE* trips, int factor);
+    NODE* test_of_end(NODE* end) const;
+    BBLK* counter_at_end(const NODE* end, BBLK* behind);
 
     struct LOOP* loop;
     BLOCKS blocks; // by number; the head first

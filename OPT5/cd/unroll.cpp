@@ -21,6 +21,8 @@
 #include "OPT5/target/target.h"
 
 #include <algorithm>
+#include <cstdarg>
+#include <cstdio>
 #include <vector>
 
 namespace {
@@ -32,41 +34,47 @@ bool is_icon(const NODE* t) { return t && t->op == ICON; }
 
 // ---- What the programmer is told
 
-std::string text_of_loop(const struct LOOP* loop) {
-    if (const NODE* p = loop->sourceLoopPragma)
-        return "'" + get_PPRAGMA_tree_arg(p, 3) + "' loop on '" + get_PPRAGMA_tree_arg(p, 1) + "' at lines " +
-               get_PPRAGMA_tree_arg(p, 0) + "-" + get_PPRAGMA_tree_arg(p, 2);
-    if (const PSN place = place_of_loop(loop); place.line) return "loop at line " + std::to_string(place.line);
-    return "loop #" + std::to_string(loop->uid);
+void tell(const char* format, ...) __attribute__((format(printf, 1, 2)));
+void tell(const char* format, ...) {
+    char text[400];
+    va_list arguments;
+    va_start(arguments, format);
+    std::vsnprintf(text, sizeof text, format, arguments);
+    va_end(arguments);
+    if (print_debug) debug_printf("%s", text);
+    if (write_opt_info && finfo) info_printf("%s", text);
 }
 
-void tell(const std::string& text) {
-    if (print_debug) debug_printf("%s", text.c_str());
-    if (write_opt_info && finfo) info_printf("%s", text.c_str());
+void report_loop(const struct LOOP* loop, const char* how, int factor) {
+    const PSN place = place_of_loop(loop);
+    if (const NODE* p = loop->sourceLoopPragma)
+        tell("Unrolling '%s' loop on '%s' at lines %s-%s%s by factor %d.\n", get_PPRAGMA_tree_arg(p, 3).c_str(),
+             get_PPRAGMA_tree_arg(p, 1).c_str(), get_PPRAGMA_tree_arg(p, 0).c_str(), get_PPRAGMA_tree_arg(p, 2).c_str(),
+             how, factor);
+    else if (place.line)
+        tell("Unrolling loop at line %lu%s by factor %d.\n", static_cast<unsigned long>(place.line), how, factor);
+    else
+        tell("Unrolling loop #%d by factor %d.\n", loop->uid, factor);
 }
 
 void report_estimated_speedup(const LOOP_UNROLLING_INFO& info) {
-    char text[160];
-    const double uf = info.unrolledFactor;
+    const auto ratio = [](uint64_t a, uint64_t b) { return static_cast<double>(a) / static_cast<double>(b ? b : 1); };
     const uint64_t space = info.unrolledSpaceCost + info.peeledIterationSpaceCost;
-    std::snprintf(text, sizeof text, "Estimated speedup: %.2fx, code size increase: %.2fx (%lu:->%lu)\n",
-                  static_cast<double>(info.originalTimeCost) * uf /
-                      static_cast<double>(std::max<uint64_t>(info.unrolledTimeCost, 1)),
-                  static_cast<double>(space) / static_cast<double>(std::max<uint64_t>(info.originalSpaceCost, 1)),
-                  static_cast<unsigned long>(info.originalSpaceCost), static_cast<unsigned long>(space));
-    tell(text);
+    tell("Estimated speedup: %.2fx, code size increase: %.2fx (%lu:->%lu)\n",
+         ratio(info.originalTimeCost * info.unrolledFactor, info.unrolledTimeCost),
+         ratio(space, info.originalSpaceCost), static_cast<unsigned long>(info.originalSpaceCost),
+         static_cast<unsigned long>(space));
 }
 
 void report_total_unrolling_factor(const LOOP_UNROLLING_INFO& info) {
     if (info.loop->unrollAmount > 1)
-        tell("Total unrolling factor for this loop: " + std::to_string(info.loop->unrollAmount * info.unrolledFactor) +
-             "x\n");
+        tell("Total unrolling factor for this loop: %sx\n",
+             std::to_string(info.loop->unrollAmount * info.unrolledFactor).c_str());
 }
 
 void report_for_unroll_for_speed(const LOOP_UNROLLING_INFO& info) {
     const int factor = static_cast<int>(info.unrolledFactor);
-    tell("Unrolling " + text_of_loop(info.loop) + (info.unrolledCompletely ? " completely" : "") + " by factor " +
-         std::to_string(factor) + ".\n");
+    report_loop(info.loop, info.unrolledCompletely ? " completely" : "", factor);
     report_estimated_speedup(info);
     report_total_unrolling_factor(info);
     if (print_debug && fdebug) info.print("unrolled", fdebug);
@@ -242,7 +250,7 @@ bool unroll_for_speed(struct LOOP* loop, bool completely) {
     std::string why;
     if (requested_factor(loop) != 0) return false;
     if (!loop_is_OK_for_unrolling(loop, false, &why)) {
-        if (print_debug) debug_printf("\tNot unrolling %s: %s\n", text_of_loop(loop).c_str(), why.c_str());
+        if (print_debug) debug_printf("\tNot unrolling loop #%d: %s\n", loop->uid, why.c_str());
         return false;
     }
     UNROLLED_BODY body(loop);
@@ -251,7 +259,7 @@ bool unroll_for_speed(struct LOOP* loop, bool completely) {
     info.characterize_loop_before_unrolling();
     const bool peeled = info.select_unrolling_factor(completely);
     if (info.unrolledFactor < 2 && print_debug) {
-        debug_printf("\tNot unrolling %s: no factor pays\n", text_of_loop(loop).c_str());
+        debug_printf("\tNot unrolling loop #%d: no factor pays\n", loop->uid);
         info.print("not unrolled", fdebug);
     }
     if (info.unrolledFactor < 2 || !rewrite_is_allowed(loop->tail->branch())) return false;

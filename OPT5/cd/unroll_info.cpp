@@ -25,6 +25,7 @@ constexpr int MOST_COPIES = 8, MOST_COMPLETE_COPIES = 32;
 constexpr int MOST_PEELED_COPIES = 4;
 constexpr int DEAREST_COUNT = 8; // to compute, ahead of the loop
 constexpr double TRIGGER = 0.02;
+constexpr size_t MOST_BLOCKS = 32, MOST_STATEMENTS = 500; // of a body that is looked at
 
 bool is_icon(const NODE* t) { return t && t->op == ICON; }
 
@@ -64,9 +65,12 @@ const char* why_not(struct LOOP* loop, bool requested) {
     if (!loop->is_bottom_tested() || loop->preheader->successors->rest) return "it is not left from its end";
     const NODE* test = loop->tail->branch();
     if (tree_has_side_effects(test->left) || test->left->op == ENDLOOP) return "its test does more than compare";
+    size_t statements = 0;
+    if (loop->contents.size() > MOST_BLOCKS) return "it is too large";
     for (const BBLK* bb : loop->contents) {
         if (bb->is_in_LIR_form() || tree_is_EH_SWITCH(bb->branch())) return "it handles exceptions";
         for (const LIST* s = bb->statements; s; s = s->rest) {
+            if (++statements > MOST_STATEMENTS) return "it is too large";
             if (s->first->op == NASSERT) continue;
             if (s->first->op == PPRAGMA || !tree_is_OK_for_unrolling(s->first) || op_is_call(s->first->op))
                 return "it has statements that are not copied, as calls and divisions";

@@ -19,6 +19,9 @@ const NODE* asserted_condition(const NODE* statement);
 // where it never does.
 std::optional<WIDE> steps_to_exit(WIDE init, WIDE limit, WIDE step, int op, int first);
 
+// The count of a loop that is tested by a variable which takes constants in turn, as a new ICON, or null (trip_trial.cpp).
+NODE* count_by_trial(struct LOOP* loop);
+
 // A new tree of values as they are written in statements.
 NODE* denormalized_copy(const NODE* tree);
 

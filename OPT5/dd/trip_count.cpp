@@ -525,7 +525,7 @@ NODE* loop_trip_count(struct LOOP* loop) {
         if (p.min == p.max && p.min > INT65(0)) return mk_ICON(p.min, wide_enough_int_type(p.min));
     }
     LOOPIV* iv = loop->LCV;
-    if (!iv) return nullptr;
+    if (!iv) return count_by_trial(loop);
     if (!iv->last || !iv->incrtree) {
         erase_tree(iv->last);
         iv->last = nullptr;

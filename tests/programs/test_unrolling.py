@@ -22,6 +22,7 @@ HEADERS = [
     ("unsigned long", "for (v = a; v < b; v++)", 1), ("long", "for (v = a; v != b; v--)", -1),
     ("int", "for (v = 3; v < 22; v++)", 0), ("unsigned", "for (v = 0; v < 9; v += 3)", 0), ("int", "for (v = 20; v >= 0; v -= 4)", 0),
     ("int", "for (v = 1; v < 38; v += 3)", 0), ("int", "v = a; if (v < b) do", 1), ("unsigned", "for (v = 65531u; v != 5; v++)", 0),
+    ("int", "for (v = 64; v; v >>= 2)", 0), ("unsigned", "for (v = 1; v < 3000; v *= 3)", 0),
 ]
 # `k` and `p` step as well; `t` is computed.
 BODIES = [

@@ -112,6 +112,13 @@ void drop_promises_of(BBLK* loop) {
     }
 }
 
+// Control no longer passes from the block to the head of a loop, which remains, perhaps: an iteration that ends there is the
+// last one, and is not counted as those are that are followed by another or by the test.
+void drop_promises_without_edge(const BBLK* from, BBLK* head) {
+    for (const EDGE* e = head->predecessors; e; e = e->rest)
+        if (e->first != from) drop_promises_in(e->first);
+}
+
 // The block that a SWITCH on a constant reaches.
 BBLK* target_of_constant_switch(const NODE* sw) {
     const INT65 value = sw->left->u.lval;
@@ -210,7 +217,10 @@ private:
             const std::vector<BBLK*> old = successors_of(bb);
             make_branch(bb, control, target);
             control_of(bb) = control->rest ? control->rest : control;
-            for (BBLK* s : old) remove_if_unreached(s);
+            for (BBLK* s : old) {
+                if (s != target) drop_promises_without_edge(bb, s);
+                remove_if_unreached(s);
+            }
             changed = true;
         }
         return changed;

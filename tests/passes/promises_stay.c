@@ -45,9 +45,10 @@ long nested(int n) {
     return sum;
 }
 
-// What is promised of the iterations of a loop is not promised of its tests.
+// What is promised of the iterations of a loop is not promised of its tests, of which there is one more.
 // FUNCTION: only_a_test
-// COUNT 0: MUST_ITERATE
+// COUNT 1: MUST_ITERATE
+// HAS: pragma 39 MUST_ITERATE("3", "3", "3")
 void only_a_test(void) {
     unsigned w;
 #pragma MUST_ITERATE(, 2, 2)
@@ -114,6 +115,26 @@ long left_within(const long *p) {
     return acc;
 }
 
+// The iteration that is known to be the last one leaves the loop, which was counted by the values of its variable.
+// FUNCTION: last_one_leaves
+// COUNT 0: MUST_ITERATE
+int last_one_leaves(void) {
+    int v = 64, t = 1;
+#pragma MUST_ITERATE(3, 4)
+    for (;;) {
+        if (v & 1) {
+            t += 5;
+            v >>= 2;
+            if (v == 0) break;
+        } else {
+            g[v & 7] ^= 7;
+            v >>= 2;
+            if (v == 0) break;
+        }
+    }
+    return t;
+}
+
 int main(void) {
     for (int i = 0; i < 8; i++) g[i] = i * i;
     put_i32(two_loops(8));
@@ -122,6 +143,7 @@ int main(void) {
     put_i32(nested(0));
     only_a_test();
     put_i16(g[3]);
+    put_i16(last_one_leaves());
     put_i32(left_at_once(5, 0) + left_at_once(4, 1) + never_run(3));
     put_i16(read_by_the_next(3));
     static const long many[16] = {0, 1, 2, 3, 4, 5, 6, 7};

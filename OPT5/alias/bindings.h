@@ -4,10 +4,10 @@
 
 #include "OPT5/alias/points_to.h"
 #include "OPT5/ir/side_table.h"
+#include "OPT5/ir/symbol_table.h"
 
 #include <deque>
 #include <functional>
-#include <unordered_map>
 #include <unordered_set>
 
 struct WRITE;
@@ -108,8 +108,8 @@ struct PT_STORE {
 
     PT_STORE() : run(next_run()) {}
     unsigned number_of(const SYMTAB* sym) const {
-        auto at = numbers.find(sym);
-        return at == numbers.end() ? NONE : at->second;
+        const unsigned* number = numbers.find(sym);
+        return number ? *number : NONE;
     }
     const PTENV* binding(const SYMTAB* sym, const PT_STATE& s) const {
         const unsigned i = number_of(sym);
@@ -131,7 +131,7 @@ struct PT_STORE {
     BINDINGS bindings;
     POINTER_MAPS maps;
     std::vector<POINTER> pointers;                       // by number, in the order in which they are met
-    std::unordered_map<const SYMTAB*, unsigned> numbers; // looked up, never walked
+    SYMBOL_TABLE<unsigned> numbers;
     SIDE_TABLE<PT_STATE> PT_IN, PT_OUT;                  // at the start and end of a block
 
 private:

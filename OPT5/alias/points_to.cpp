@@ -61,9 +61,9 @@ bool is_kept_track_of(const SYMTAB* sym) {
 
 void PROPAGATION::enter(SYMTAB* ptr) {
     OPT_ASSERT(ptr != NULL);
-    if (!is_kept_track_of(ptr) || store.pointers.size() == MOST_POINTERS) return;
-    if (store.numbers.emplace(ptr, static_cast<unsigned>(store.pointers.size())).second)
-        store.pointers.push_back({ptr, only_its_name_reaches(ptr)});
+    if (store.numbers.find(ptr) || !is_kept_track_of(ptr) || store.pointers.size() == MOST_POINTERS) return;
+    store.numbers[ptr] = static_cast<unsigned>(store.pointers.size());
+    store.pointers.push_back({ptr, only_its_name_reaches(ptr)});
 }
 
 void PROPAGATION::find_pointers() {

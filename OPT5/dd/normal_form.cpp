@@ -391,7 +391,7 @@ void rewrite_statements(const F& rewrite) {
 NODE* denormalize_tree(NODE* t, bool keep_ddnodes) { return denormalize(t, keep_ddnodes); }
 
 void normalize_all_trees() {
-    init_dd_aliasing();
+    need(fact::alias_marks);
     rewrite_statements([](NODE* t) { return normalize(t, tree_is_arg_prolog(t)); });
     trees_are_normalized = true;
 }

@@ -81,7 +81,7 @@ bool names_memory(const NODE* statement) {
 }
 
 bool function_names_memory() {
-    need(fact::alias);
+    need(fact::alias_marks);
     for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
         for (const LIST* s = bb->statements; s; s = s->rest)
             if (s->first && !tree_is_arg_prolog(s->first) && names_memory(s->first)) return true;

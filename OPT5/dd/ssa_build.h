@@ -3,8 +3,8 @@
 
 #include "OPT5/dd/ssa.h"
 #include "OPT5/ir/list.h"
+#include "OPT5/ir/symbol_table.h"
 
-#include <unordered_map>
 #include <unordered_set>
 #include <vector>
 
@@ -36,7 +36,7 @@ struct SSA_STATE {
     std::vector<std::unique_ptr<SSAVAR>> variables; // by uid
     std::vector<SSA_DEFINITION> definitions;        // by version
     std::vector<std::unique_ptr<std::vector<SSA_ARG>>> args;
-    std::unordered_map<const SYMTAB*, SSAVAR*> direct, indirect; // the first entry of a ring; looked up, never walked
+    SYMBOL_TABLE<SSAVAR*> direct, indirect; // the first entry of a ring
 };
 extern SSA_STATE ssa_state;
 

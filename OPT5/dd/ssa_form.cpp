@@ -94,6 +94,12 @@ struct EVENT {
     bool is_use; // otherwise a definition
 };
 
+// A variable's definition before the one that the renaming walk has come to.
+struct SAVED {
+    uint32_t uid;
+    NODE* before;
+};
+
 // Lists by number, which keep their room from one function to the next: most functions are small, and there are many.
 template <class V>
 class REUSED_LISTS {
@@ -109,11 +115,24 @@ private:
 };
 
 struct BUILD_LISTS {
+    std::vector<SSA_SITE> sites;
     REUSED_LISTS<EVENT> events;           // by variable, in the order of blocks and sites
     REUSED_LISTS<int> live_in;            // by variable: blocks at whose start it is live
     REUSED_LISTS<int> definers;           // by variable: blocks with a definition or chi
     REUSED_LISTS<uint32_t> live_at_entry; // by block
     REUSED_LISTS<NODE*> phis;             // by block
+    // Numbers of the predecessors, which are walked for each variable: those of block b from `first_before[b]` on.
+    std::vector<int> before_blocks;
+    std::vector<size_t> first_before;
+    // While chis are placed: what is live, that which is memory as a list.
+    std::vector<SSAVAR*> live_memory;
+    std::vector<uint32_t> live;    // all that was, in the block in work
+    std::vector<int32_t> place_of; // by variable: 0 dead, below 0 live, otherwise 1 + its place in `live_memory`
+    // While renaming.
+    std::vector<NODE*> current; // by variable
+    std::vector<SAVED> saved;
+    std::vector<size_t> marks; // heights of `saved` where blocks began
+    std::vector<NODE*> chain;
 };
 BUILD_LISTS build_lists;
 
@@ -125,6 +144,8 @@ public:
         definers.restart(variables.size());
         live_at_entry.restart(build.blocks.size());
         phis.restart(build.blocks.size());
+        before_blocks.clear();
+        live_memory.clear();
     }
     // False, with operators that have no versions, where there are too many.
     bool run() {
@@ -164,22 +185,14 @@ private:
     REUSED_LISTS<NODE*>& phis = build_lists.phis;
     int64_t definitions_left = MOST_SSA_DEFINITIONS + 4 * build.references(); // chis and phis
     int64_t live_left = 8 * MOST_SSA_DEFINITIONS + 32 * build.references(); // entries of live sets
-    // Numbers of the predecessors, which are walked for each variable: those of block b from `first_before[b]` on.
-    std::vector<int> before_blocks;
-    std::vector<size_t> first_before;
-    // While chis are placed: what is live, that which is memory as a list.
-    std::vector<SSAVAR*> live_memory;
-    std::vector<uint32_t> live; // all that was, in the block in work
-    std::vector<int32_t> place_of; // by variable: 0 dead, below 0 live, otherwise 1 + its place in `live_memory`
-    // While renaming.
-    std::vector<NODE*> current; // by variable
-    struct SAVED {
-        uint32_t uid;
-        NODE* before;
-    };
-    std::vector<SAVED> saved;
-    std::vector<size_t> marks; // heights of `saved` where blocks began
-    std::vector<NODE*> chain;
+    std::vector<int>& before_blocks = build_lists.before_blocks;
+    std::vector<size_t>& first_before = build_lists.first_before;
+    std::vector<SSAVAR*>& live_memory = build_lists.live_memory;
+    std::vector<uint32_t>& live = build_lists.live;
+    std::vector<int32_t>& place_of = build_lists.place_of;
+    std::vector<NODE*>&current = build_lists.current, &chain = build_lists.chain;
+    std::vector<SAVED>& saved = build_lists.saved;
+    std::vector<size_t>& marks = build_lists.marks;
 };
 
 // A use also may read what overlaps the variable: an SSA_MU for each.
@@ -433,6 +446,8 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo, bool onlyMem
         promote_toplevel_COMMAOPs_in_list(bb->statements, bb->last_statement());
     need(fact::dominators | fact::alias | fact::points_to);
     SSA_BUILD build;
+    build.sites.swap(build_lists.sites); // for their room
+    build.sites.clear();
     build.onlySSV = onlySSV;
     build.onlyIV = onlyIV;
     build.vectorsToo = vectorsToo;
@@ -440,9 +455,11 @@ void construct_SSA_form(bool onlySSV, bool onlyIV, bool vectorsToo, bool onlyMem
     ssa_state.definitions.assign(1, {});
     wrap_SSA_references(build);
     function_is_in_SSA_form = true;
-    if (ssa_state.variables.empty() || ssa_state.variables.size() > MOST_SSA_VARIABLES) return deconstruct_SSA_form();
-    mark_all_overlaps();
-    if (!BUILDER(build).run()) return deconstruct_SSA_form();
+    const bool fits = !ssa_state.variables.empty() && ssa_state.variables.size() <= MOST_SSA_VARIABLES;
+    if (fits) mark_all_overlaps();
+    const bool is_built = fits && BUILDER(build).run();
+    build_lists.sites.swap(build.sites);
+    if (!is_built) return deconstruct_SSA_form();
     if (print_debug >= 3) dump_SSA_function_body();
     if (pass_debug_validate && validate_SSA_form() != 0) abort_optimizer("SSA form is not valid");
 }

@@ -154,13 +154,13 @@ SSAVAR* SSAVAR_for_reference(const NODE* lvalue, const SSA_BUILD& build) {
 }
 
 SSAVAR* find_SSAVAR_ring(const SYMTAB* sym) {
-    auto at = ssa_state.direct.find(sym);
-    return at == ssa_state.direct.end() ? nullptr : at->second;
+    SSAVAR* const* first = ssa_state.direct.find(sym);
+    return first ? *first : nullptr;
 }
 
 SSAVAR* find_pointed_SSAVAR_ring(const SYMTAB* sym) {
-    auto at = ssa_state.indirect.find(sym);
-    return at == ssa_state.indirect.end() ? nullptr : at->second;
+    SSAVAR* const* first = ssa_state.indirect.find(sym);
+    return first ? *first : nullptr;
 }
 
 bool covers(const SSAVAR* whole, const SSAVAR* part) {

@@ -10,10 +10,13 @@
 #include "OPT5/ir/rewrite_limit.h"
 #include "UTIL/abort.h"
 
+#include <algorithm>
 #include <cctype>
 #include <cstdio>
 #include <cstdlib>
 #include <ctime>
+#include <mutex>
+#include <unordered_map>
 #include <vector>
 
 namespace {
@@ -77,7 +80,32 @@ void do_work(const ROW& row, const ROW_LABEL& label) {
     if (currfuninfo) changed(row.leaves); // the last step leaves no current function
 }
 
+// ---- Times
+
+struct ROW_TIME {
+    std::string name;
+    long ticks = 0, runs = 0;
+};
+std::vector<ROW_TIME> row_times; // in the order in which the rows came first
+std::unordered_map<const ROW*, std::size_t> time_of_row;
+std::mutex row_times_lock;
+
+void add_time(const ROW& row, const ROW_LABEL& label, long ticks) {
+    const std::lock_guard<std::mutex> guard(row_times_lock);
+    const auto [at, is_new] = time_of_row.try_emplace(&row, row_times.size());
+    if (is_new) row_times.push_back({label.text() + " '" + row.name + "'"});
+    row_times[at->second].ticks += ticks;
+    ++row_times[at->second].runs;
+}
+
 } // namespace
+
+void report_row_times(FILE* out) {
+    std::stable_sort(row_times.begin(), row_times.end(), [](const ROW_TIME& a, const ROW_TIME& b) { return a.ticks > b.ticks; });
+    std::fprintf(out, "\n");
+    for (const ROW_TIME& t : row_times)
+        std::fprintf(out, "%8.3f secs in %ld runs of %s\n", static_cast<double>(t.ticks) / CLOCKS_PER_SEC, t.runs, t.name.c_str());
+}
 
 void run_row(const ROW& row, const ROW_LABEL& label, bool skip) {
     if (skip || is_left_out(row)) {
@@ -94,6 +122,7 @@ void run_row(const ROW& row, const ROW_LABEL& label, bool skip) {
         const clock_t ticks = std::clock() - start;
         if (print_debug) debug_printf("(%.1f sec for pass.)\n", static_cast<double>(ticks) / CLOCKS_PER_SEC);
         if (funinfo) funinfo->time += ticks;
+        add_time(row, label, ticks);
     }
     if (print_debug) debug_printf("\n");
     announce("EXITING", row, label);

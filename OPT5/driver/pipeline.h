@@ -10,6 +10,7 @@
 
 #include "OPT5/ir/facts.h"
 
+#include <cstdio>
 #include <string>
 
 // What stands around the work of a row: its first half before, its second half behind.
@@ -47,6 +48,9 @@ struct ROW_LABEL {
 // Runs a row of a function or a barrier: left out by switch, under its condition, in its frame, between its facts. The
 // function is dumped before and behind to the debug stream, and validated behind under `debug:validate`.
 void run_row(const ROW& row, const ROW_LABEL& label, bool skip);
+
+// Under `enable:time_stats`, behind the run: the time of each row, with that of its frame, over all functions.
+void report_row_times(FILE* out);
 
 // The two tables beside the steps, for the current function.
 void run_rows_behind_reading();

@@ -245,4 +245,5 @@ void report_times(long ticks) {
     std::fprintf(out, "\n");
     std::stable_sort(timed.begin(), timed.end(), [](const FUNINFO* a, const FUNINFO* b) { return a->time > b->time; });
     for (const FUNINFO* f : timed) std::fprintf(out, "%s:  %.2f secs\n", f->name.c_str(), seconds(f->time));
+    report_row_times(out);
 }

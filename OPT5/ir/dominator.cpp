@@ -45,7 +45,10 @@ void iterate(const std::vector<int>& sequence, const LISTS& preds, std::vector<i
 // A walk over a graph or tree, and how far it has come in the list of each node on its path.
 class PATH {
 public:
-    PATH(int root, const LISTS& lists) : lists(lists) { enter(root); }
+    PATH(int root, const LISTS& lists) : lists(lists) {
+        nodes.reserve(32); // what most functions take
+        enter(root);
+    }
     bool is_empty() const { return nodes.empty(); }
     int last() const { return nodes.back().node; }
     void enter(int node) {

@@ -18,8 +18,26 @@
 #include <string>
 
 // ---- Memory
-void* NODE::operator new(std::size_t) { return record_pool<sizeof(NODE)>::take(); }
-void NODE::operator delete(void* p) { record_pool<sizeof(NODE)>::give(p); }
+namespace {
+
+// The operators of SSA form come in the order of a walk over the whole function, those for memory and where definitions
+// meet behind the others, and go together. In cells of their own they lie in that order: taken from the cells that are
+// free between the trees, they would send each walk over a large function to memory twice a node.
+using TREE_CELLS = record_pool<sizeof(NODE)>;
+using REFERENCE_CELLS = record_pool<sizeof(NODE), 1>; // SSA_USE, SSA_DEF
+using MEETING_CELLS = record_pool<sizeof(NODE), 2>;   // the others
+
+void* take_cell(int op) {
+    if (!op_is_SSA(op)) return TREE_CELLS::take();
+    return op == SSA_USE || op == SSA_DEF ? REFERENCE_CELLS::take() : MEETING_CELLS::take();
+}
+
+void give_cell(NODE* t, int op) {
+    if (!op_is_SSA(op)) return TREE_CELLS::give(t);
+    return op == SSA_USE || op == SSA_DEF ? REFERENCE_CELLS::give(t) : MEETING_CELLS::give(t);
+}
+
+} // namespace
 
 const RARE_FIELDS NODE::no_rare_fields;
 
@@ -29,7 +47,7 @@ RARE_FIELDS& NODE::make_rare() {
 }
 
 NODE* clone_node(const NODE* t) {
-    NODE* c = new NODE(*t);
+    NODE* c = new (take_cell(t->op)) NODE(*t);
     if (!t->rare_m) return c;
     c->rare_m = new RARE_FIELDS(*t->rare_m);
     c->rare_m->dd = nullptr;
@@ -40,9 +58,9 @@ NODE* clone_node(const NODE* t) {
 }
 
 // The destructor has nothing to do and is left out, so that a pooled cell keeps the ILLOP that marks it.
-void free_node(NODE* t) {
+void free_node(NODE* t, int op) {
     delete t->rare_m;
-    NODE::operator delete(t);
+    give_cell(t, op);
 }
 
 // ---- Construction
@@ -63,7 +81,7 @@ void note_call() {
 } // namespace
 
 NODE* new_node(int op, TYPE* type) {
-    NODE* t = new NODE;
+    NODE* t = new (take_cell(op)) NODE;
     t->op = op;
     t->type = type;
     switch (op) {

@@ -164,13 +164,10 @@ public:
         right = static_cast<NODE*>(r);
     }
 
-    static void* operator new(std::size_t size);
-    static void operator delete(void* p);
-
 private:
     friend NODE* new_node(int op, TYPE* type);
     friend NODE* clone_node(const NODE* t);
-    friend void free_node(NODE* t);
+    friend void free_node(NODE* t, int op);
     NODE() : mval(nullptr) {}
     NODE(const NODE&) = default;
     ~NODE() override = default;
@@ -185,8 +182,9 @@ NODE* new_node(int op, TYPE* type);
 // A copy of the record, with what an analysis keeps of the node left out; the caller puts its owned parts and operands
 // right. Used by `copy_node`.
 NODE* clone_node(const NODE* t);
-// Gives the record back, with its rare fields, but without touching what else it owns. Used by `erase_node`.
-void free_node(NODE* t);
+// Gives the record of a node that was an `op` back, with its rare fields, but without touching what else it owns. Used
+// by `erase_node`.
+void free_node(NODE* t, int op);
 
 // A node with operands. SCONV, PCONV and ACONV take the type without its qualifiers.
 NODE* maketree(int op, NODE* left, NODE* right, TYPE* type, LS* ls = nullptr);

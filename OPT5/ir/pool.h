@@ -16,7 +16,9 @@
 constexpr std::size_t HUGE_BLOCK = std::size_t(2) << 20;
 void* take_huge_block(); // of HUGE_BLOCK bytes, for good
 
-template <std::size_t Size>
+// Pools of one size with different kinds share no cells: what is made at one time lies together, and stays apart from
+// what is made between.
+template <std::size_t Size, int Kind = 0>
 class record_pool {
 public:
     static void* take() {

@@ -162,8 +162,9 @@ static void drop_payload(NODE* t) {
 void erase_node(NODE* t) {
     if (t->op == ILLOP) report_double_erase(t);
     drop_payload(t);
+    const int op = t->op;
     t->op = ILLOP;
-    free_node(t);
+    free_node(t, op);
 }
 
 void erase_tree(NODE* t) {

@@ -23,13 +23,13 @@
 #include "OPT5/ir/rewrite_limit.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/symbol_maps.h"
+#include "OPT5/ir/symbol_table.h"
 #include "OPT5/ir/trees.h"
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/scalar/simpcfg.h"
 #include "OPT5/simp/simp.h"
 #include "UTIL/abort.h"
 
-#include <unordered_map>
 #include <unordered_set>
 #include <vector>
 
@@ -159,7 +159,6 @@ struct COUNTS {
 
 class SWEEP {
 public:
-    SWEEP() { counts.max_load_factor(1.0); }
     bool run(); // one pass; true if it changed a statement
     bool decided_a_branch = false;
 
@@ -177,7 +176,7 @@ private:
     NODE* subst(NODE* t);
     NODE* value_for(NODE* name);
 
-    std::unordered_map<const SYMTAB*, COUNTS> counts;
+    SYMBOL_TABLE<COUNTS> counts;
     std::vector<SYMTAB*> symbols; // in the order of the lists
     bool in_entry = false;        // the block being counted is entered once
     bool in_prolog = false;
@@ -248,9 +247,8 @@ bool SWEEP::has_one_value(SYMTAB* sym, const COUNTS& c) const {
 // A variable that is given its value once, before anything can copy it, and keeps it to the end of the function.
 bool SWEEP::is_lasting_name(const NODE* t) const {
     if (t->op != NAME || t->type->is_volatile()) return false;
-    auto it = counts.find(t->u.sym);
-    if (it == counts.end() || !has_one_value(t->u.sym, it->second)) return false;
-    return it->second.from_prolog || it->second.at_entry;
+    const COUNTS* c = counts.find(t->u.sym);
+    return c && has_one_value(t->u.sym, *c) && (c->from_prolog || c->at_entry);
 }
 
 bool SWEEP::is_propagable(SYMTAB* sym, const COUNTS& c) const {
@@ -354,7 +352,7 @@ bool SWEEP::rewrite_statement(LIST* s) {
     if (tree_is_arg_prolog(s->first)) return false;
     tree_changed = false;
     const bool was_decided = is_decided(s->first);
-    s->first = subst(s->first);
+    if (!currfuninfo->snmap->empty()) s->first = subst(s->first);
     if (opt_level() >= 2) s->first = subst_globals(s->first, &tree_changed);
     if (!tree_changed) return false;
     changed = true;

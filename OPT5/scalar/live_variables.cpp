@@ -108,13 +108,18 @@ private:
 };
 
 // One candidate after the other: from the blocks that read it back over the edges, up to those that assign it. That takes
-// as long as the sets are large, where equations over bit vectors take the product of blocks and candidates.
+// as long as the sets are large, where equations over bit vectors take the product of blocks and candidates. Blocks are
+// their places in the list here, so that the walk over the edges touches no block.
 class LIVENESS {
 public:
     explicit LIVENESS(size_t count) : count(count) {}
 
     void run() {
+        number_blocks();
         const std::vector<MENTION> mentions = by_bit();
+        ends_at.assign(blocks.size(), NOT_A_CANDIDATE);
+        entered.assign(blocks.size(), NOT_A_CANDIDATE);
+        live.reserve(mentions.size()); // where what is live in a block is named there, as in most
         const MENTION *m = mentions.data(), *end = m + mentions.size();
         for (size_t bit = 0; bit < count; ++bit) {
             const MENTION* first = m;
@@ -126,18 +131,35 @@ public:
 
 private:
     struct MENTION {
-        BBLK* bb;
+        uint32_t block;
         uint16_t bit;
         bool reads, assigns;
     };
+    struct LIVE {
+        uint32_t block;
+        uint16_t bit;
+    };
+
+    void number_blocks() {
+        SIDE_TABLE<uint32_t> number;
+        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
+            number[bb] = static_cast<uint32_t>(blocks.size());
+            blocks.push_back(bb);
+        }
+        for (const BBLK* bb : blocks) {
+            first_before.push_back(static_cast<uint32_t>(before.size()));
+            for (const EDGE* e = bb->predecessors; e; e = e->rest) before.push_back(number[e->first]);
+        }
+        first_before.push_back(static_cast<uint32_t>(before.size()));
+    }
 
     std::vector<MENTION> by_bit() const {
         std::vector<MENTION> found;
         std::vector<size_t> next(count + 1, 0); // by bit: where its mentions begin, then where the next one stands
         USE_DEF_WALK walk(static_cast<uint32_t>(count));
-        for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-            walk.run(bb, [&](uint32_t bit, bool reads, bool assigns) {
-                found.push_back({bb, static_cast<uint16_t>(bit), reads, assigns});
+        for (size_t b = 0; b < blocks.size(); ++b)
+            walk.run(blocks[b], [&](uint32_t bit, bool reads, bool assigns) {
+                found.push_back({static_cast<uint32_t>(b), static_cast<uint16_t>(bit), reads, assigns});
                 ++next[bit + 1];
             });
         std::partial_sum(next.begin(), next.end(), next.begin());
@@ -147,52 +169,42 @@ private:
     }
 
     void spread(const MENTION* mentions, size_t n) {
+        size_t looked_at = live.size();
         for (size_t i = 0; i < n; ++i)
-            if (mentions[i].assigns) ends_at[mentions[i].bb] = mentions[i].bit;
+            if (mentions[i].assigns) ends_at[mentions[i].block] = mentions[i].bit;
         for (size_t i = 0; i < n; ++i)
-            if (mentions[i].reads) enter(mentions[i].bb, mentions[i].bit);
-        while (!waiting.empty()) {
-            const auto [bb, bit] = waiting.back();
-            waiting.pop_back();
-            for (const EDGE* e = bb->predecessors; e; e = e->rest)
-                if (ends_at[e->first] != bit && entered[e->first] != bit) enter(e->first, bit);
+            if (mentions[i].reads) enter(mentions[i].block, mentions[i].bit);
+        for (; looked_at < live.size(); ++looked_at) {
+            const LIVE at = live[looked_at];
+            for (uint32_t i = first_before[at.block]; i < first_before[at.block + 1]; ++i)
+                if (ends_at[before[i]] != at.bit && entered[before[i]] != at.bit) enter(before[i], at.bit);
         }
     }
 
-    void enter(const BBLK* bb, uint16_t bit) {
-        entered[bb] = bit;
-        live.push_back({bb, bit});
-        waiting.push_back({bb, bit});
+    void enter(uint32_t block, uint16_t bit) {
+        entered[block] = bit;
+        live.push_back({block, bit});
     }
 
     void make_lists() const {
         auto sets = std::make_unique<LIVE_SETS>();
-        for (const LIVE& l : live) ++sets->at_entry[l.bb].count;
-        uint32_t from = 0;
-        for (const BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink) {
-            LIVE_SETS::ENTRY& entry = sets->at_entry[bb];
-            entry.is_known = true;
-            entry.from = from;
-            from += entry.count;
-            entry.count = 0;
+        std::vector<uint32_t> next(blocks.size() + 1, 0); // by block: where its list begins, then where its next bit stands
+        for (const LIVE& l : live) ++next[l.block + 1];
+        for (size_t b = 0; b < blocks.size(); ++b) {
+            sets->at_entry[blocks[b]] = {next[b], next[b + 1], true};
+            next[b + 1] += next[b];
         }
-        sets->lists.resize(from);
-        for (const LIVE& l : live) {
-            LIVE_SETS::ENTRY& entry = sets->at_entry[l.bb];
-            sets->lists[entry.from + entry.count++] = l.bit;
-        }
+        sets->lists.resize(live.size());
+        for (const LIVE& l : live) sets->lists[next[l.block]++] = l.bit;
         currfuninfo->live_sets = std::move(sets);
     }
 
-    struct LIVE {
-        const BBLK* bb;
-        uint16_t bit;
-    };
     const size_t count;
+    std::vector<BBLK*> blocks; // in the order of the list
+    std::vector<uint32_t> before, first_before; // the predecessors of block b: from `first_before[b]` on
     std::vector<LIVE> live; // at the entries of blocks, by ascending bits
-    std::vector<LIVE> waiting;
     // By block: the last candidate that it assigns, and that is live at its entry, of those looked at so far.
-    SIDE_TABLE<uint16_t> ends_at{NOT_A_CANDIDATE}, entered{NOT_A_CANDIDATE};
+    std::vector<uint16_t> ends_at, entered;
 };
 
 } // namespace

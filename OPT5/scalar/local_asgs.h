@@ -1,6 +1,8 @@
 // The assignments in force along a chain of blocks, each entered from the one before alone: what reads may be replaced by.
 #pragma once
 
+#include "OPT5/ir/symbol_table.h"
+
 #include <cstdint>
 #include <unordered_map>
 #include <unordered_set>
@@ -71,7 +73,7 @@ private:
     NODE* cp_indirect_RL(NODE* t);
 
     const unsigned kinds;
-    std::unordered_map<const SYMTAB*, int64_t> depnums; // the number of a variable's changes
+    SYMBOL_TABLE<int64_t> depnums; // the number of a variable's changes
     std::unordered_map<const SYMTAB*, NAMED> names;     // looked up, never walked but to free
     std::vector<PART> parts;
     bool any = false;     // replaced in the statement in work

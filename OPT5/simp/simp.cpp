@@ -335,6 +335,26 @@ struct PLACE {
 
 bool has_lvalue(const NODE* t) { return opcode_is_ASG(t->op) || t->op == UAND || t->op == ARGREF; }
 
+// A stack that needs no memory of its own for most trees.
+class PLACES {
+public:
+    bool is_empty() const { return !count; }
+    PLACE& top() { return at(count - 1); } // until the next push
+    void push(const PLACE& place) {
+        if (count >= FEW && more.size() <= count - FEW) more.emplace_back();
+        at(count++) = place;
+    }
+    void pop() { --count; }
+
+private:
+    static constexpr size_t FEW = 16;
+    PLACE& at(size_t i) { return i < FEW ? few[i] : more[i - FEW]; }
+
+    PLACE few[FEW];
+    std::vector<PLACE> more;
+    size_t count = 0;
+};
+
 // The place that a conditional chooses is none of the values there.
 bool is_chosen_place(const NODE* t) { return t->op == UMULT && is_strict_ternary_ICALL(t->left); }
 
@@ -342,23 +362,22 @@ bool is_chosen_place(const NODE* t) { return t->op == UMULT && is_strict_ternary
 
 NODE* simp_tree(NODE* tree, struct LOOP* loop) {
     if (!tree) return tree;
-    std::vector<PLACE> open;
-    open.reserve(16); // what most trees take
-    open.push_back({&tree, false, false});
-    while (!open.empty()) {
-        PLACE& place = open.back();
+    PLACES open;
+    open.push({&tree, false, false});
+    while (!open.is_empty()) {
+        PLACE& place = open.top();
         NODE* t = *place.link;
         if (t->op == ASSERT && t != tree) {
             *place.link = simp_assertion(t);
-            open.pop_back();
+            open.pop();
         } else if (place.operands_are_done || (!t->left && !t->right)) {
             if (!place.is_lvalue || !is_chosen_place(t)) *place.link = simp_node(t, loop);
-            open.pop_back();
+            open.pop();
         } else {
             if (t == tree && t->op == ASSERT) return simp_assertion(t);
             place.operands_are_done = true;
-            if (t->right) open.push_back({&t->right, false, false});
-            if (t->left) open.push_back({&t->left, false, has_lvalue(t)});
+            if (t->right) open.push({&t->right, false, false});
+            if (t->left) open.push({&t->left, false, has_lvalue(t)});
         }
     }
     return tree;

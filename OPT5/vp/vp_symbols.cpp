@@ -11,10 +11,10 @@
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
+#include "OPT5/ir/symbol_table.h"
 #include "OPT5/ir/symtab.h"
 
 #include <algorithm>
-#include <unordered_map>
 
 namespace {
 
@@ -122,18 +122,16 @@ private:
         asked.push_back(number);
     }
     int number_of(SYMTAB* sym) {
-        auto [at, is_new] = numbers.try_emplace(sym, NOTHING);
-        if (is_new && may_be_tracked(sym)) {
-            at->second = static_cast<int>(candidates.size());
-            candidates.push_back({sym, false});
-        }
-        return at->second;
+        if (const int* number = numbers.find(sym)) return *number;
+        if (!may_be_tracked(sym)) return numbers[sym] = NOTHING;
+        candidates.push_back({sym, false});
+        return numbers[sym] = static_cast<int>(candidates.size()) - 1;
     }
 
     const VP_QUESTION question;
     const bool asks_all;
     bool in_loop = false;
-    std::unordered_map<const SYMTAB*, int> numbers; // looked up alone
+    SYMBOL_TABLE<int> numbers;
     std::vector<CANDIDATE> candidates;
     std::vector<int> asked; // candidates
     std::vector<PART> parts;

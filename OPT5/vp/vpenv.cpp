@@ -26,8 +26,8 @@ VPENV_STORE::VPENV_STORE(std::vector<SYMTAB*> tracked, size_t global)
 }
 
 int VPENV_STORE::number_of(const SYMTAB* sym) const {
-    auto it = numbers.find(sym);
-    return it == numbers.end() ? -1 : it->second;
+    const int* number = numbers.find(sym);
+    return number ? *number : -1;
 }
 
 const vpset* VPENV_STORE::find(vpenv env, int number) const {

@@ -7,6 +7,7 @@
 // function live in one store, from `init_vpenv_allocation` to `erase_vpenv`.
 #pragma once
 
+#include "OPT5/ir/symbol_table.h"
 #include "OPT5/vp/vpset.h"
 
 #include <cstdint>
@@ -85,7 +86,7 @@ private:
 
     std::vector<SYMTAB*> symbols;
     int first_global;
-    std::unordered_map<const SYMTAB*, int> numbers; // looked up alone
+    SYMBOL_TABLE<int> numbers;
     int levels = 0;
     uint32_t epoch = 1;
     std::vector<PART> parts{PART()}; // part 0 binds nothing

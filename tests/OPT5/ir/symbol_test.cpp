@@ -1,5 +1,10 @@
 #include "function_fixture.h"
 
+#include "OPT5/ir/symbol_table.h"
+
+#include <map>
+#include <random>
+
 namespace {
 
 class SymbolTest : public FunctionTest {
@@ -231,6 +236,29 @@ TEST_F(SymbolTest, ScopesNestAndHoldTheirSymbolsInOrder) {
     EXPECT_FALSE(LS::object_may_be_live_in_scope(c, sibling));
     EXPECT_TRUE(LS::object_may_be_live_in_scope(a, sibling));
     currfuninfo->ls_root->validate();
+}
+
+// ---- Tables
+
+TEST_F(SymbolTest, ATableHoldsWhatAMapHolds) {
+    std::vector<SYMTAB*> symbols{nullptr};
+    for (int i = 0; i < 400; ++i) symbols.push_back(make_symbol("t", tp->int_t, SC_AUTO, 2));
+    std::mt19937 random(1);
+    SYMBOL_TABLE<int> table;
+    for (int size : {1, 401, 20, 150}) { // cleared in between, with its room kept
+        std::map<const SYMTAB*, int> map;
+        table.clear();
+        for (int i = 0; i < 1000; ++i) {
+            const SYMTAB* sym = symbols[random() % size * 7 % symbols.size()]; // numbers far apart
+            ASSERT_EQ(table.find(sym) != nullptr, map.count(sym) != 0);
+            ASSERT_EQ(table[sym], map[sym]);
+            table[sym] = map[sym] = i;
+        }
+        for (const SYMTAB* sym : symbols) {
+            const int* value = table.find(sym);
+            ASSERT_EQ(value ? *value : -1, map.count(sym) ? map[sym] : -1);
+        }
+    }
 }
 
 } // namespace

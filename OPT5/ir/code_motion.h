@@ -53,7 +53,7 @@ using INSERTIONS = std::vector<std::vector<CANDIDATES>>;
 
 // A place where a candidate occurs, or where what it stands for may change.
 struct MOTION_EVENT {
-    enum KIND : uint8_t { USE, DEF, KILL };
+    enum KIND : uint8_t { USE, DEF, KILL, STEP }; // STEP: it changes by an amount, and the temporary may go along
     KIND kind;
     size_t block;
     int order;                   // of the statement in its block
@@ -118,6 +118,7 @@ void MOTION::enter_block(CANDIDATES bit, const EVENTS& events, size_t begin, siz
     bool is_changed = false;
     for (size_t i = begin; i < end; ++i) {
         const MOTION_EVENT& e = events[i];
+        if (e.kind == MOTION_EVENT::STEP) continue;
         if (e.kind == MOTION_EVENT::USE) {
             if (e.is_conditional) continue;
             if (!is_changed && e.order <= first_stop) s.ANTLOC |= bit;
@@ -142,6 +143,7 @@ bool decide_reads(EVENTS& events, CANDIDATES bit, const std::vector<CANDIDATES>&
         bool is_known = known[b] & bit, is_local = false, is_set = false;
         for (size_t i = begin; i < end; ++i) {
             MOTION_EVENT& e = events[i];
+            if (e.kind == MOTION_EVENT::STEP) continue;
             if (e.kind == MOTION_EVENT::USE) {
                 e.is_deleted = is_known;
                 e.is_local = is_local;
@@ -157,14 +159,16 @@ bool decide_reads(EVENTS& events, CANDIDATES bit, const std::vector<CANDIDATES>&
     return any_deleted;
 }
 
-// Which occurrences set the temporary: those whose value is read from it.
+// Which occurrences set the temporary: those whose value is read from it. Which steps it takes: those ahead of a read.
 template <class EVENTS>
 void decide_saves(EVENTS& events, CANDIDATES bit, const std::vector<CANDIDATES>& live_at_end) {
     for_each_block(events, [&](size_t b, size_t begin, size_t end) {
         bool is_live = live_at_end[b] & bit;
         for (size_t i = end; i-- > begin;) {
             MOTION_EVENT& e = events[i];
-            if (e.kind == MOTION_EVENT::USE && e.is_deleted)
+            if (e.kind == MOTION_EVENT::STEP)
+                e.is_saved = is_live;
+            else if (e.kind == MOTION_EVENT::USE && e.is_deleted)
                 is_live |= !e.is_new;
             else if (!e.is_conditional) {
                 e.is_saved = is_live && e.kind != MOTION_EVENT::KILL;

@@ -10,6 +10,9 @@
 // Sound because a computation is placed only where every path from there computes the expression before its operands
 // change (so that nothing is computed that was not, and nothing traps that did not; a statement that may not pass
 // control on counts as a change for what may trap), and is taken away only where all paths have it in the temporary.
+// A sum of multiples of variables does not count as changed by a statement that steps one of them by a constant: the
+// temporary goes along there, in arithmetic that wraps, wherever it is read behind. So a + 5 * i is computed ahead of a loop
+// over i. Not what addresses are made of: they become pointers later on.
 // Of a statement with effects among its reads those operands take part that none of the effects may change.
 // Edges that exceptions take, and those out of a block that ends in their dispatch, get no computation.
 //
@@ -19,7 +22,8 @@
 // equations that register promotion uses for its loads (code_motion.h); elsewhere they count as changed.
 //
 // Sources: E. Morel, C. Renvoise, "Global Optimization by Suppression of Partial Redundancies", 1979; D. M. Dhamdhere,
-// "Practical Adaptation of the Global Optimization Algorithm of Morel and Renvoise", 1991 (insertion on edges).
+// "Practical Adaptation of the Global Optimization Algorithm of Morel and Renvoise", 1991 (insertion on edges);
+// R. Kennedy et al., "Strength Reduction via SSAPRE", 1998 (steps).
 #include "OPT5/scalar/gcse.h"
 
 #include "OPT5/alias/effects.h"
@@ -36,6 +40,7 @@
 #include "OPT5/scalar/gdflow.h"
 #include "OPT5/scalar/subrange.h"
 #include "OPT5/scalar/triples.h"
+#include "OPT5/simp/exact.h"
 
 #include <algorithm>
 #include <deque>
@@ -58,6 +63,7 @@ enum FACT_BIT : uint8_t {
 struct EVENT : MOTION_EVENT {
     const TRIPLE_SITE* site;               // null where the expression changes
     const TRIPLE_RENEWAL* renewal = nullptr; // of a DEF
+    const TRIPLE_STEP* step = nullptr;       // of a STEP
 };
 
 // What all expressions of a function share.
@@ -119,6 +125,7 @@ private:
     void find_local_facts();
     void enter_block(int block, size_t begin, size_t end, const TRIPLE_RENEWAL* renewal);
     void enter_sites(size_t begin, size_t end, CHANGES c);
+    void enter_steps(int block, size_t first_event, CHANGES c);
     bool renews(const TRIPLE_RENEWAL& r) const;
     bool compute_PAVIN();
     bool is_partially_available();
@@ -214,24 +221,41 @@ void EXPRESSION::enter_block(int block, size_t begin, size_t end, const TRIPLE_R
     if (c.first) c.last = std::max(c.first, function.last_change(t, block, with_memory));
     reach(block, c.first);
     size_t ahead = begin;
+    const size_t first_event = events.size();
     while (ahead < end && (!c.first || t.sites[ahead].position <= c.first)) ++ahead;
     enter_sites(begin, ahead, c);
-    if (!c.first) return;
+    if (!c.first) return enter_steps(block, first_event, c);
     const auto b = static_cast<size_t>(block);
     const bool is_renewed = renewal && renewal->position == c.last && renews(*renewal);
     if (c.first != c.last) events.push_back({{MOTION_EVENT::KILL, b, c.first}, nullptr});
     events.push_back({{is_renewed ? MOTION_EVENT::DEF : MOTION_EVENT::KILL, b, c.last}, nullptr, renewal});
     if (is_renewed) at(block) |= AVLOC;
     enter_sites(ahead, end, c);
+    enter_steps(block, first_event, c);
+}
+
+// In a statement that steps, what it reads comes first.
+void EXPRESSION::enter_steps(int block, size_t first_event, CHANGES c) {
+    const auto begin = std::lower_bound(t.steps.begin(), t.steps.end(), block,
+                                        [](const TRIPLE_STEP& s, int b) { return s.block < b; });
+    for (auto s = begin; s != t.steps.end() && s->block == block; ++s) {
+        if (c.first && s->position > c.first && s->position < c.last) continue;
+        const EVENT step{{MOTION_EVENT::STEP, static_cast<size_t>(block), s->position}, nullptr, nullptr, &*s};
+        events.insert(std::upper_bound(events.begin() + static_cast<ptrdiff_t>(first_event), events.end(), step,
+                                       [](const EVENT& a, const EVENT& b) { return a.order < b.order; }),
+                      step);
+    }
 }
 
 void EXPRESSION::find_local_facts() {
     events.clear();
-    size_t site = 0, renewal = 0;
-    while (site < t.sites.size() || renewal < t.renewals.size()) {
+    size_t site = 0, renewal = 0, step = 0;
+    while (site < t.sites.size() || renewal < t.renewals.size() || step < t.steps.size()) {
         const int of_site = site < t.sites.size() ? t.sites[site].block : INT32_MAX;
         const int of_renewal = renewal < t.renewals.size() ? t.renewals[renewal].block : INT32_MAX;
-        const int block = std::min(of_site, of_renewal);
+        const int of_step = step < t.steps.size() ? t.steps[step].block : INT32_MAX;
+        const int block = std::min({of_site, of_renewal, of_step});
+        while (step < t.steps.size() && t.steps[step].block == block) ++step;
         size_t end = site;
         while (end < t.sites.size() && t.sites[end].block == block) ++end;
         for (; renewal < t.renewals.size() && t.renewals[renewal].block == block; ++renewal) {}
@@ -245,6 +269,7 @@ void EXPRESSION::find_local_facts() {
 bool EXPRESSION::renews(const TRIPLE_RENEWAL& r) const {
     constexpr int MOST_BLOCKS = 4;
     const TRIPLE& other = unique_triples[r.other];
+    if (!other.steps.empty()) return false;
     const BBLK* bb = r.bb;
     int before = r.position;
     for (int n = 0; n < MOST_BLOCKS; ++n, before = INT32_MAX) {
@@ -285,6 +310,7 @@ bool EXPRESSION::compute_PAVIN() {
     }
     size_t last = 0; // block
     return function.blocks_left >= 0 && std::any_of(events.begin(), events.end(), [&](const EVENT& e) {
+        if (e.kind == MOTION_EVENT::STEP) return false;
         const bool is_first = e.block != last;
         last = e.block;
         return is_first && e.site && (at(static_cast<int>(e.block)) & PAVIN);
@@ -388,8 +414,10 @@ bool BATCH::pays(const EXPRESSION& e) const {
     const double cost = e.t.cost;
     double gain = 0;
     size_t deleted = 0;
+    size_t steps = 0;
     for (const EVENT& at : e.events) {
         if (at.kind == MOTION_EVENT::KILL) continue;
+        steps += at.kind == MOTION_EVENT::STEP && at.is_saved;
         const double runs = function.runs.of(graph.blocks[at.block]);
         deleted += at.is_deleted;
         if (at.is_deleted)
@@ -398,7 +426,7 @@ bool BATCH::pays(const EXPRESSION& e) const {
             gain -= runs;
     }
     for (const EDGE_PLACE& place : inserted_on) gain -= (cost + 1) * function.runs.of_edge(place.from, place.to);
-    if (size_speed_goal() < 2 && inserted_on.size() >= deleted) return false;
+    if (size_speed_goal() < 2 && inserted_on.size() + steps >= deleted) return false;
     return gain > 1e-6;
 }
 
@@ -474,6 +502,7 @@ private:
     void keep_what_stands(TRIPLE& t);
     bool must_wait(const EXPRESSION& e, const std::unordered_set<const NODE*>& held_back) const;
     bool is_induction(const TRIPLE& t) const;
+    static void add_step(const TRIPLE_STEP& step, SYMTAB* temp);
     void apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>& insertions);
     void finish();
 
@@ -539,7 +568,7 @@ void GLOBAL_CSE::find_steps() {
 // A linear expression of a loop's counters is made a counter itself later on, which a temporary of its parts would
 // hide.
 bool GLOBAL_CSE::is_induction(const TRIPLE& t) const {
-    if (!is_linear(t.tree)) return false;
+    if (!t.steps.empty() || !is_linear(t.tree)) return false;
     return std::any_of(t.sites.begin(), t.sites.end(), [&](const TRIPLE_SITE& site) {
         const NATURAL_LOOP* loop = outermost_loop_around(site.bb);
         return loop && std::any_of(t.variables.begin(), t.variables.end(),
@@ -547,21 +576,45 @@ bool GLOBAL_CSE::is_induction(const TRIPLE& t) const {
     });
 }
 
+// The temporary goes along with the variable.
+void GLOBAL_CSE::add_step(const TRIPLE_STEP& step, SYMTAB* temp) {
+    TYPE* type = temp->type;
+    const INT65 by = truncate_to_type(INT65(0, step.amount), type), back = truncate_to_type(INT65(0, -step.amount), type);
+    const int op = back < by ? MINUSASG : PLUSASG;
+    NODE* t = maketree(op, mk_NAME(temp), mk_ICON(std::min(by, back), type), type, nullptr);
+    if (print_debug) debug_printf("\tSR increment added in block %d:\t %s\n", step.block, stmt2infix(t).c_str());
+    insert_behind(step.cell, t, step.cell->psn);
+}
+
 void GLOBAL_CSE::apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>& insertions) {
     const TRIPLE& t = e.t;
     const char letter = op_is_call(t.tree->op) ? 'K' : 'U'; // what a call gave, or else
-    SYMTAB* temp = sym_temp(letter, -1, t.tree->type->stqs(), t.tree->ls);
+    const bool steps = std::any_of(e.events.begin(), e.events.end(), [](const EVENT& at) {
+        return at.kind == MOTION_EVENT::STEP && at.is_saved;
+    });
+    // What goes along with a variable may leave the type where the expression is not computed: it wraps.
+    TYPE* type = steps ? tp->mk_unsigned(t.tree->type->stqs()) : t.tree->type->stqs();
+    SYMTAB* temp = sym_temp(letter, -1, type, t.tree->ls);
+    // So may the expression itself where it stands ahead of a step.
+    auto copy = [&t, steps] { return steps ? as_wrapping(copy_tree(t.tree), nullptr) : copy_tree(t.tree); };
+    auto set = [temp, type](NODE* value, auto* where) {
+        return mk_ASG(mk_NAME(temp, where), coerce_to_type(type, value));
+    };
     const std::string text = print_debug ? tree_to_infix(t.tree) : std::string();
     auto name = [temp](const NODE* like) { return coerce_to_type(like->type->stqs(), mk_NAME(temp, like->ls)); };
     for (const BATCH::EDGE_PLACE& p : insertions) {
         if (print_debug) debug_printf("\tInsertion in block %d:\t %s\n", p.from->dfn, text.c_str());
-        on_edges.add(p.from, p.to, mk_ASG(mk_NAME(temp, nullptr), copy_tree(t.tree)));
+        on_edges.add(p.from, p.to, set(copy(), t.tree->ls));
     }
     for (const EVENT& at : e.events) {
         if (at.kind == MOTION_EVENT::KILL || !(at.is_deleted || at.is_saved)) continue;
+        if (at.step) {
+            add_step(*at.step, temp);
+            continue;
+        }
         if (at.renewal) { // it becomes a copy of what the other expression gave, once values are numbered
             LIST* cell = at.renewal->cell;
-            insert_behind(cell, mk_ASG(mk_NAME(temp, nullptr), copy_tree(t.tree)), cell->psn);
+            insert_behind(cell, set(copy(), t.tree->ls), cell->psn);
             if (print_debug) debug_printf("\tTemp added in block %d:\t %s\n", at.renewal->block, temp->name);
             continue;
         }
@@ -575,7 +628,7 @@ void GLOBAL_CSE::apply(const EXPRESSION& e, const std::vector<BATCH::EDGE_PLACE>
             continue;
         }
         // What it consists of is looked at later, and stands ahead of it then.
-        ahead[s.cell].push_back({-++applied, mk_ASG(mk_NAME(temp, value->ls), value)});
+        ahead[s.cell].push_back({-++applied, set(value, value->ls)});
         if (print_debug) debug_printf("\tTemp added in block %d:\t %s\n", s.block, temp->name);
     }
 }

@@ -19,6 +19,8 @@
 #include "OPT5/scalar/lcse.h"
 #include "OPT5/scalar/subrange.h"
 #include "OPT5/scalar/triples.h"
+#include "OPT5/simp/exact.h"
+#include "OPT5/simp/linear.h"
 #include "OPT5/target/bif.h"
 
 #include <boost/container_hash/hash.hpp>
@@ -127,6 +129,10 @@ std::unordered_map<const SYMTAB*, std::vector<TRIPLE_WRITE>> variable_writes; //
 std::vector<TRIPLE_WRITE> memory_writes, staying;
 std::vector<TRIPLE_SITE> all_sites; // by triple
 
+// Of variables to which a constant amount is added by whole statements, these and the other writes. Looked up, never walked.
+std::unordered_map<const SYMTAB*, std::vector<TRIPLE_STEP>> variable_steps;
+std::unordered_map<const SYMTAB*, std::vector<TRIPLE_WRITE>> other_writes;
+
 // The number of a tree says what it is; the triple, where it is computed.
 class ANNOTATOR {
 public:
@@ -171,6 +177,8 @@ private:
     size_t triple_of(int number);
     TRIPLE new_triple(int number);
     void find_lvalues_of(TRIPLE& t);
+    static void find_writes_of(TRIPLE& t);
+    void read_value(NODE* assignment);
     void find_renewals();
     void find_renewals_of(size_t triple);
     static TREE_KEY shape_of(const NODE* tree, double cost) {
@@ -209,6 +217,7 @@ private:
     BBLK* block = nullptr;
     LIST* cell = nullptr;
     int position = 0;
+    int pointers_around = 0;
 };
 
 void ANNOTATOR::enter_writes(const BBLK* bb, const NODE* t, int at) {
@@ -405,6 +414,56 @@ void ANNOTATOR::find_lvalues_of(TRIPLE& t) {
     }
 }
 
+// How many x a tree adds up, modulo 2^width, times `by`. False where it is no such sum.
+bool add_coefficient(const NODE* t, const SYMTAB* x, uint64_t width, uint64_t by, uint64_t* sum) {
+    if (!sym_appears_in_tree(x, t)) return true;
+    const bool is_widened = t->op == SCONV && t->left->op == NAME && is_exact_by_rule(PLUS, t->left->type);
+    const NODE* name = is_widened && t->left->type->size < width ? t->left : t;
+    if (!t->type->is_int() || t->type->is_bool() || t->type->size != width) return false;
+    if (t->op == SCONV && t->left->op != NAME && !t->left->type->is_unsigned()) return false; // may have to wrap
+    if (name->op == NAME) {
+        *sum += by;
+        return name->type->stqs() == x->type->stqs();
+    }
+    LINEAR_STEP s;
+    return linear_step(t, &s) && add_coefficient(s.a, x, width, by * static_cast<uint64_t>(s.by_a), sum) &&
+           (!s.b || add_coefficient(s.b, x, width, by * static_cast<uint64_t>(s.by_b), sum));
+}
+
+// But for the steps.
+const std::vector<TRIPLE_WRITE>& other_writes_of(const SYMTAB* x) {
+    const auto [at, is_new] = other_writes.try_emplace(x);
+    if (!is_new) return at->second;
+    const std::vector<TRIPLE_STEP>& steps = variable_steps.at(x);
+    size_t step = 0;
+    for (const TRIPLE_WRITE& w : writes_of_variable(x)) {
+        const bool is_step = step < steps.size() && steps[step].block == w.block && steps[step].position == w.position;
+        is_step ? void(++step) : at->second.push_back(w);
+    }
+    return at->second;
+}
+
+// A pointer is made a counter itself later on, with what it is computed from.
+void ANNOTATOR::find_writes_of(TRIPLE& t) {
+    const TRIPLE_SITES& sites = t.sites;
+    const bool may_step = t.tree->type->is_int() && !t.may_trap && !t.reads_memory &&
+                          std::none_of(sites.begin(), sites.end(), [](const TRIPLE_SITE& s) { return s.may_be_counter; });
+    for (const SYMTAB* x : t.variables) {
+        uint64_t coefficient = 0;
+        auto at = variable_steps.find(x);
+        if (!may_step || at == variable_steps.end() || !add_coefficient(t.tree, x, t.tree->type->size, 1, &coefficient)) {
+            t.writes.push_back(&writes_of_variable(x));
+            continue;
+        }
+        t.writes.push_back(&other_writes_of(x));
+        for (const TRIPLE_STEP& s : at->second)
+            t.steps.push_back({s.block, s.position, s.cell, s.amount * coefficient});
+    }
+    std::sort(t.steps.begin(), t.steps.end(), [](const TRIPLE_STEP& a, const TRIPLE_STEP& b) {
+        return a.block != b.block ? a.block < b.block : a.position < b.position;
+    });
+}
+
 TRIPLE ANNOTATOR::new_triple(int number) {
     const ENTRY& e = entries[static_cast<size_t>(number)];
     TRIPLE t;
@@ -421,7 +480,7 @@ TRIPLE ANNOTATOR::new_triple(int number) {
         else if (std::find(t.variables.begin(), t.variables.end(), n->u.sym) == t.variables.end())
             t.variables.push_back(n->u.sym);
     });
-    for (const SYMTAB* x : t.variables) t.writes.push_back(&writes_of_variable(x));
+    find_writes_of(t);
     if (t.reads_memory) find_lvalues_of(t);
     return t;
 }
@@ -432,10 +491,36 @@ void ANNOTATOR::read(NODE*& slot, bool is_certain) {
     if (good_CSE_tree(t, false) && type_code(t->type) && !mixed.is_out(t)) {
         const KNOWN k = number(t);
         if (k.number != NO_TRIPLE && k.cost > 0)
-            sites.push_back({k.number, static_cast<float>(k.cost),
-                             {block->dfn, position, &slot, block, cell, is_certain && !mixed.must_stay(t)}});
+            sites.push_back({k.number,
+                             static_cast<float>(k.cost),
+                             {block->dfn, position, &slot, block, cell, is_certain && !mixed.must_stay(t),
+                              pointers_around > 0}});
     }
+    pointers_around += t->type->is_pointer();
     read_operands(t, is_certain);
+    pointers_around -= t->type->is_pointer();
+}
+
+// All that a variable is assigned may make that a counter.
+void ANNOTATOR::read_value(NODE* assignment) {
+    const size_t first = sites.size();
+    read(assignment->right, true);
+    if (is_private_name(assignment->left) && sites.size() > first && sites[first].place.slot == &assignment->right)
+        sites[first].place.may_be_counter = true;
+}
+
+// x op= constant, or x = x op constant.
+bool is_step(const NODE* t, uint64_t* amount) {
+    if ((!is_operator_assignment(t) && t->op != ASG) || !t->right) return false;
+    if (!is_private_name(t->left) || !t->left->type->is_int()) return false;
+    const SYMTAB* x = t->left->u.sym;
+    const bool is_plain = t->op == ASG;
+    const NODE *sum = is_plain ? t->right : t, *by = sum->right;
+    const int op = is_plain ? sum->op : op_of_opASG[t->op];
+    if ((op != PLUS && op != MINUS) || !by || by->op != ICON) return false;
+    if (sum->left->op != NAME || sum->left->u.sym != x || sum->type->stqs() != t->left->type->stqs()) return false;
+    *amount = op == PLUS ? by->u.lval.value : -by->u.lval.value;
+    return true;
 }
 
 void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
@@ -445,6 +530,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
     known.clear();
     NODE* t = s->first;
     enter_writes(bb, t, at);
+    if (uint64_t amount = 0; is_step(t, &amount)) variable_steps[t->left->u.sym].push_back({bb->dfn, at, s, amount});
     if (!reads_come_first(t)) {
         if (mixed.enter(t)) for_each_read_of_mixed(t, reader());
         return mixed.clear();
@@ -458,7 +544,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
         if ((t->right->op == CALL && !is_computing_call(t->right)) || t->op == STASG)
             read_operands(t->right, true);
         else
-            read(t->right, true);
+            read_value(t);
         if (assigns_variable(t)) {
             const KNOWN value = number(t->right);
             if (value.number != NO_TRIPLE)
@@ -595,6 +681,8 @@ void clean_up_gdflow_bitvecs() {
     unique_triple_count = triple_site_count = 0;
     triples_alias_table.clear();
     variable_writes.clear();
+    variable_steps.clear();
+    other_writes.clear();
     std::vector<TRIPLE_WRITE>().swap(memory_writes);
     std::vector<TRIPLE_WRITE>().swap(staying);
 }

@@ -147,6 +147,7 @@ struct TRIPLE_SITE {
     BBLK* bb;
     LIST* cell;
     bool is_certain; // whenever the statement is evaluated
+    bool may_be_counter; // a counter of a loop may be made of it or of what it is part of: of an address, or a variable
 };
 
 // An assignment `x = e` of a variable that a triple reads, behind which the triple has the value of another: of the same
@@ -164,6 +165,15 @@ struct TRIPLE_WRITE {
     int block;
     int position;
     const NODE* statement;
+};
+
+// A statement that changes a triple by an amount, as `i += 1` changes a + 5 * i by 5: no change where the temporary goes
+// along.
+struct TRIPLE_STEP {
+    int block;
+    int position;
+    LIST* cell;
+    uint64_t amount; // modulo the width of the triple
 };
 
 // Those of one triple, in the order of blocks and statements: a part of the list of all.
@@ -187,7 +197,8 @@ struct TRIPLE {
     bool reads_memory = false;
     bool is_asked_whole = false; // a call in it reads memory: the table does not tell what alters that
     std::vector<const SYMTAB*> variables; // private ones that it reads
-    std::vector<const std::vector<TRIPLE_WRITE>*> writes; // of these
+    std::vector<const std::vector<TRIPLE_WRITE>*> writes; // of these, but for the steps
+    std::vector<TRIPLE_STEP> steps;       // in the order of blocks and statements
     std::vector<size_t> lvalues;          // other ones, by their numbers in the table of aliases
     TRIPLE_SITES sites;
     std::vector<TRIPLE_RENEWAL> renewals; // in the order of blocks and statements

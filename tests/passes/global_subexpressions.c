@@ -73,6 +73,32 @@ int beside_other_effects(int a, int b, int c) {
     return E(a, b);
 }
 
+// The temporary goes along with a variable that is stepped; behind the last use it may leave the type.
+// FUNCTION: goes_along
+// COUNT 1: * 5
+// HAS: /^\$O\$U\d \+= 5$/
+int goes_along(int i, int n, int a) {
+    for (; i < n; i++) {
+        use(a + 5 * i);
+        if (i & 1) use((a + 5 * i) ^ 3);
+    }
+    return i;
+}
+
+// FUNCTION: goes_along_in_one_arm
+// COUNT 1: * 38
+// HAS: /^\$O\$U\d -= 74$/
+long goes_along_in_one_arm(int n, int k) {
+    int i = k, j;
+    long s = 0;
+    for (j = 0; j < n; j++) {
+        if (j % 3 == 1) i -= 2;
+        use(j);
+        s += ((long)i * 37 + k) ^ j;
+    }
+    return s;
+}
+
 // A displacement that no access has room for is added once; one that it has belongs to it.
 int far[40000];
 // FUNCTION: out_of_reach
@@ -275,6 +301,8 @@ int main(void) {
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
     for (c = 1; c < 7; c++) { put_i16(beside_effects(c, 3, c & 3, buffer)); put_i16(cell + buffer[0]); }
     for (c = 1; c < 7; c++) { put_i16(beside_other_effects(c, 3, c)); put_i16(beside_other_effects(9 * c, 3, 4)); }
+    put_i16(goes_along(1, 6, 32740)); put_i16(goes_along(-3, 4, -7)); put_i16(hits);
+    put_i32(goes_along_in_one_arm(8, 900)); put_i32(goes_along_in_one_arm(0, 900));
     put_i16(out_of_reach(9)); put_i16(far[35000]);
     put_i16(divides(5, 2)); put_i16(divides(0, 0)); put_i16(hits);
     put_i16(divides(4, 0));

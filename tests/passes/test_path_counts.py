@@ -34,12 +34,15 @@ class Graph:
     def expression(self):
         if self.rng.random() < 0.6:
             return f"{self.name}_@_{self.rng.choice(CALLEES)}(a, b)"
-        return f"(a {self.rng.choice(OPERATORS)} b)"
+        if self.rng.random() < 0.6:
+            return f"(a {self.rng.choice(OPERATORS)} b)"
+        return self.rng.choice(("(a * 3 + b)", "((b << 2) - a)", "((long)(int)a * 3 + (int)b)"))  # steps with its variables
 
     def statement(self):
         e, x = self.expression, self.expression()
         return self.rng.choice((
-            lambda: f"c += {e()};", lambda: f"d = {e()} - c;", lambda: f"a += {self.rng.choice(('1', 'c & 3'))};",
+            lambda: f"c += {e()};", lambda: f"d = {e()} - c;", lambda: f"a += {self.rng.choice(('1', '1', 'c & 3'))};",
+            lambda: "b -= 3;",
             lambda: "b = d & 15;", lambda: f"g = {e()};", lambda: f"hit({e()});",
             # Effects among the reads.
             lambda: f"c = hit(d) + {e()};", lambda: f"d = (g = {e()}) - {e()};", lambda: f"c += (d++ & 1) + {e()};",

@@ -203,7 +203,16 @@ bool cd_unroll_inner_loops_completely() {
 
 namespace {
 
-bool unroll_by_request(struct LOOP* loop, int factor) {
+// `work` tells whether it unrolled the loop; it may count it by what its variable has on entry.
+template <class F>
+bool with_count(struct LOOP* loop, F work) {
+    const bool is_counted_here = count_from_entry(loop);
+    if (work()) return true;
+    if (is_counted_here) forget_count_from_entry(loop);
+    return false;
+}
+
+bool unroll_counted_by_request(struct LOOP* loop, int factor) {
     std::string why;
     if (!loop_is_OK_for_unrolling(loop, true, &why)) {
         refuse(loop, why);
@@ -230,6 +239,10 @@ bool unroll_by_request(struct LOOP* loop, int factor) {
     return true;
 }
 
+bool unroll_by_request(struct LOOP* loop, int factor) {
+    return with_count(loop, [=] { return unroll_counted_by_request(loop, factor); });
+}
+
 } // namespace
 
 bool cd_unroll_loops_by_request() {
@@ -246,9 +259,8 @@ bool cd_unroll_loops_by_request() {
 
 namespace {
 
-bool unroll_for_speed(struct LOOP* loop, bool completely) {
+bool unroll_counted_for_speed(struct LOOP* loop, bool completely) {
     std::string why;
-    if (requested_factor(loop) != 0) return false;
     if (!loop_is_OK_for_unrolling(loop, false, &why)) {
         if (print_debug) debug_printf("\tNot unrolling loop #%d: %s\n", loop->uid, why.c_str());
         return false;
@@ -265,6 +277,11 @@ bool unroll_for_speed(struct LOOP* loop, bool completely) {
     if (info.unrolledFactor < 2 || !rewrite_is_allowed(loop->tail->branch())) return false;
     unroll(info, peeled, body);
     return true;
+}
+
+bool unroll_for_speed(struct LOOP* loop, bool completely) {
+    if (requested_factor(loop) != 0) return false;
+    return with_count(loop, [=] { return unroll_counted_for_speed(loop, completely); });
 }
 
 } // namespace

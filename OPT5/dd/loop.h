@@ -299,6 +299,10 @@ void prove_IV_affine(LOOPIV* iv, const NODE* init, const NODE* last, INT65 incr,
 NODE* loop_trip_count(struct LOOP* loop); // a new tree in normal form, or null
 void calculate_trip_count(struct LOOP* loop);
 void characterize_trip_count(struct LOOP* loop);
+// The count of a loop whose control variable begins with what is not known: `trips` names the variable then, and is true of
+// its value ahead of the loop alone. Whether it was found; for who changes the loop at once, or forgets it again.
+bool count_from_entry(struct LOOP* loop);
+void forget_count_from_entry(struct LOOP* loop);
 
 // ---- loop_variables.cpp
 void check_if_LCV_used_in_loop(struct LOOP* loop, struct LOOP* inner);

@@ -582,3 +582,24 @@ void calculate_trip_count(struct LOOP* loop) {
     }
     characterize_trip_count(loop);
 }
+
+bool count_from_entry(struct LOOP* loop) {
+    LOOPIV* iv = loop->LCV;
+    if (loop->is_root() || loop->trips || !iv || iv->init || !iv->last || !iv->incrtree || loop->has(LOOP_early_exit))
+        return false;
+    iv->init = mk_NAME(iv->sym);
+    NODE* trips = loop_trip_count(loop);
+    if (trips) {
+        loop->trips = trips;
+        characterize_trip_count(loop);
+    }
+    erase_tree(iv->init);
+    iv->init = nullptr;
+    return trips != nullptr;
+}
+
+void forget_count_from_entry(struct LOOP* loop) {
+    if (loop->trips && loop->trips->op == ICON) return;
+    erase_tree(loop->trips);
+    loop->trips = nullptr;
+}

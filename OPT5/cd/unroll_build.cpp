@@ -297,7 +297,8 @@ NODE* UNROLLED_BODY::test_of_end(NODE* end) const {
     const bool is_unsigned = type->is_pointer() || type->is_unsigned();
     const bool goes_down =
         sign_extend_by_type_size(loop->LCV->incrtree->u.lval, loop->LCV->incrtree->type).is_negative();
-    int op = loop->test == NEQ ? NEQ : goes_down ? (is_unsigned ? UGT : GT) : (is_unsigned ? ULT : LT);
+    // It meets the end, which lets pointers take the test; of an unsigned one it is to be told that it does not wrap.
+    int op = loop->test == NEQ || !is_unsigned ? NEQ : goes_down ? (is_unsigned ? UGT : GT) : (is_unsigned ? ULT : LT);
     if (!stays_if_true) op = boolean_inv[op];
     return maketree(op, mk_NAME(loop->LCV->sym), end, tp->int_t);
 }

@@ -44,7 +44,7 @@ public:
     // It is not, perhaps: the copies run as often as they can, behind them the iterations left over.
     //
     //     do { body; i++; } while (i < n)     t = n - i; end = i + (t & -4);
-    //                                         if (t >= 4) do { body; body; body; body; i += 4; } while (i < end)
+    //                                         if (t >= 4) do { body; body; body; body; i += 4; } while (i != end)
     //                                         if (t & 2) { body; body; }
     //                                         if (t & 1) body;
     void unroll(int factor, const REST& rest);

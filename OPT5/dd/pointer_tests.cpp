@@ -7,7 +7,8 @@
 // pointer has come as many steps as the counter, or one more or less where only one of them steps ahead of the test. It
 // was at no earlier test where it is then: its steps are too few to wrap. An unsigned counter may wrap ahead of
 // a limit that is met alone, so that its number of steps is no difference; but those where the limit is the last value
-// that it can take.
+// that it can take. A signed counter may step by more than one to a limit that is met alone: the pointer, which steps by a
+// multiple, meets its own where the counter does.
 #include "OPT5/alias/effects.h"
 #include "OPT5/ir/bblk.h"
 #include "OPT5/ir/funinfo.h"
@@ -64,6 +65,7 @@ private:
         if (trips >= 0) return true;
         const TYPE* type = counter->sym->type;
         const int64_t by = step();
+        if (test->stay_op == NEQ && type->is_signed() && test->limit->op == NAME) return true; // it is met
         if ((by != 1 && by != -1) || (test->step_comes_first && type->is_unsigned() && test->stay_op != NEQ)) return false;
         if (is_one_of(test->stay_op, ULE, UGE, ULE, UGE) && type->size == 32) return false;
         if (test->stay_op == NEQ && type->is_unsigned()) {
@@ -80,6 +82,7 @@ private:
         const BBLK* bb = pointer->steps.front().bb;
         if (loops.around(bb) != loop || !loops.dominates_latches(bb, loop)) return false;
         if (!is_private_scalar(pointer->sym)) return false;
+        if (trips < 0 && stride() % step() != 0) return false;
         const int64_t size = std::abs(stride());
         const bool is_short = trips >= 0 && trips < 32768;
         return size == 1 || (size < 32768 && (counter->sym->type->size == 16 || is_short));
@@ -103,7 +106,7 @@ private:
 
     // The pointer at the first test that leaves, where the counter is `limit` then.
     NODE* end_address() const {
-        const int64_t k = stride() * step();
+        const int64_t k = stride() / step();
         NODE* start = mk_NAME(pointer->sym);
         LINEAR_ADDRESS end;
         end.base = start;

@@ -16,12 +16,14 @@ from zbench import Tools  # noqa: E402
 # The counter's type, the header from `a` to `b`, and the step: pairs of `a` and `b` are made from it.
 HEADERS = [
     ("int", "for (v = a; v < b; v++)", 1), ("int", "for (v = a; v <= b; v += 3)", 3), ("int", "for (v = a; v != b; v += 2)", 2),
-    ("int", "for (v = a; v > b; v--)", -1), ("int", "for (v = a; v >= b; v -= 7)", -7), ("int", "v = a; while (v-- > b)", -1),
+    ("int", "for (v = a; v > b; v--)", -1), ("int", "for (v = a; v >= b; v -= 7)", -7), ("int", "v = a; @ while (v-- > b)", -1),
     ("int", "for (v = 0; v < b; v++)", 1), ("unsigned", "for (v = a; v < b; v++)", 1), ("unsigned", "for (v = a; v != b; v += 1)", 1),
-    ("unsigned", "for (v = a; v > b; v -= 2)", -2), ("unsigned", "v = b; while (v--)", 1), ("long", "for (v = a; v < b; v += 5)", 5),
+    ("unsigned", "for (v = a; v > b; v -= 2)", -2), ("unsigned", "v = b; @ while (v--)", 1), ("long", "for (v = a; v < b; v += 5)", 5),
     ("unsigned long", "for (v = a; v < b; v++)", 1), ("long", "for (v = a; v != b; v--)", -1),
     ("int", "for (v = 3; v < 22; v++)", 0), ("unsigned", "for (v = 0; v < 9; v += 3)", 0), ("int", "for (v = 20; v >= 0; v -= 4)", 0),
-    ("int", "for (v = 1; v < 38; v += 3)", 0), ("int", "v = a; if (v < b) do", 1), ("unsigned", "for (v = 65531u; v != 5; v++)", 0),
+    ("int", "for (v = 1; v < 38; v += 3)", 0), ("int", "v = a; if (v < b) @ do", 1), ("unsigned", "for (v = 65531u; v != 5; v++)", 0),
+    ("int", "v = a; if (flag) v += k - 9; @ for (; v < b; v++)", 1), ("long", "v = a; if (flag) v += k - 9; @ for (; v > b; v -= 3)", -3),
+    ("unsigned", "v = b; if (flag) v += k - 9; @ while (v--)", 1),
     ("int", "for (v = 64; v; v >>= 2)", 0), ("unsigned", "for (v = 1; v < 3000; v *= 3)", 0),
 ]
 # `k` and `p` step as well; `t` is computed.
@@ -72,10 +74,11 @@ def program(seed):
             "    for (i = 0; i < 200; i++) h = h * 31 + (unsigned)w[i];\n    put_i32(v); put_i16(t); put_i16(k); put_u32(h); }\n"]
     calls = []
     for n, ((kind, header, step), body) in enumerate(itertools.product(HEADERS, BODIES)):
-        loop = f"{choice.choice(PRAGMAS)}{header} {{ {body} }}"
         if header.endswith("do"):
-            loop = f"v = a; if (v < b) {choice.choice(PRAGMAS)} do {{ {body.replace('continue', 'goto next')} next: v++; }} while (v < b);"
-            loop = loop.replace("#pragma", "\n#pragma")
+            loop = f"{header} {{ {body.replace('continue', 'goto next')} next: v++; }} while (v < b);"
+        else:
+            loop = f"{header if '@' in header else '@ ' + header} {{ {body} }}"
+        loop = loop.replace("@", "\n" + choice.choice(PRAGMAS))
         text.append(f"void f{n}({kind} a, {kind} b) {{ {kind} v = 0; int t = 1, k = 9, j; int *p = w + 50; begin(); j = 0;\n"
                     f"{loop}\n show((long)v + j, t, k + (int)(p - w)); }}\n")
         suffix = {"int": "", "unsigned": "u", "long": "L", "unsigned long": "uL"}[kind]

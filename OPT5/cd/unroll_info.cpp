@@ -23,7 +23,7 @@ constexpr uint64_t MOST_ORIGINAL_SPACE = 55, MOST_UNROLLED_SPACE = 110;
 constexpr int MOST_COPIES = 8, MOST_COMPLETE_COPIES = 32;
 // A rest is worth its tests, and the growth, for so many copies.
 constexpr int MOST_PEELED_COPIES = 4;
-constexpr int DEAREST_COUNT = 8; // to compute, ahead of the loop
+constexpr uint64_t DEAREST_COUNT = 8; // to compute, ahead of the loop
 constexpr double TRIGGER = 0.02;
 constexpr size_t MOST_BLOCKS = 32, MOST_STATEMENTS = 500; // of a body that is looked at
 
@@ -266,23 +266,30 @@ bool LOOP_UNROLLING_INFO::has_one_test() const {
     return true;
 }
 
-// What the main loop's test is made of, and that the count is worth its computing.
+// A division by a power of two becomes a shift.
+static uint64_t cost_of_count(const NODE* trips) {
+    constexpr uint64_t LESS_THAN_DIVISION = 12;
+    const bool is_shift = trips->op == DIV && is_icon(trips->right) && power_of_2(trips->right->u.lval) > 0;
+    return time_of(trips) - (is_shift ? LESS_THAN_DIVISION : 0);
+}
+
+// What the main loop's test is made of.
 static bool rest_can_be_made(const struct LOOP* loop) {
     const LOOPIV* iv = loop->LCV;
     if (!iv || !is_icon(iv->incrtree) || iv->incrtree->u.lval.is_zero() || find_widened_symbol_entry(iv->sym))
         return false;
     if (!iv->has(IV_affine) || loop->test == EQ || loop->test == ILLOP) return false;
     const NODE* trips = loop->trips;
-    if (!trips->type->is_int() || trips->type->size > 32 || tree_has_side_effects(trips)) return false;
-    return time_of(trips) <= DEAREST_COUNT;
+    return trips->type->is_int() && trips->type->size <= 32 && !tree_has_side_effects(trips);
 }
 
 bool LOOP_UNROLLING_INFO::peel_excess_loop_iterationsp() const {
     const uint32_t u = unrolledFactor;
     if (unrolledCompletely || !count_is_exact() || !rest_can_be_made(loop)) return false;
-    if (u == userRequestedUF) return !is_multiple_of(u);
-    if (!maximumTripCount.is_zero() && maximumTripCount <= INT65(static_cast<int64_t>(u))) return false;
-    return !is_multiple_of(u);
+    if (is_multiple_of(u)) return false;
+    if (u == userRequestedUF) return true;
+    const bool may_be_more = maximumTripCount.is_zero() || maximumTripCount > INT65(static_cast<int64_t>(u));
+    return may_be_more && cost_of_count(loop->trips) <= DEAREST_COUNT;
 }
 
 REST LOOP_UNROLLING_INFO::rest() const {

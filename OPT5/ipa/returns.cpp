@@ -37,7 +37,6 @@ public:
     COUNTED_LOOP(const NATURAL_LOOP& of, const NATURAL_LOOPS& all) : loop(of), loops(all) {}
 
     bool ends() const {
-        if (!loop.is_reducible) return false;
         for (const BBLK* bb : loop.blocks)
             if (runs_once_an_iteration(bb))
                 for (const LIST* s = bb->statements; s; s = s->rest)
@@ -122,8 +121,12 @@ private:
         if (t->op == PLUSPLUS || t->op == MINMIN) t = t->left;
         return t->op == NAME ? t->u.sym : nullptr;
     }
+    // Computed from variables that the loop leaves alone.
     bool is_invariant(const NODE* t) const {
-        return t->op == ICON || (t->op == NAME && only_its_name_reaches(t->u.sym) && writes_of(t->u.sym) == 0);
+        return !any_subtree(t, [this](const NODE* n) {
+            if (n->op == NAME) return !only_its_name_reaches(n->u.sym) || writes_of(n->u.sym) != 0;
+            return op_has_effect(n->op) || op_is_load(n->op) || op_is_intrinsic(n->op);
+        });
     }
 
     const NATURAL_LOOP& loop;

@@ -1,5 +1,6 @@
 // A function without calls says that it is a leaf; one with calls, direct or by pointer, does not.
 // RUN: --opt_level=2 --disable_inlining
+// LEVELS: 1 3 4
 #include <stdlib.h>
 #include <zrun.h>
 
@@ -55,6 +56,7 @@ int counts_down(int k) {
     int s = 0;
     while (n--) s += a[n];
     for (n = 9; n > 2u; --n) g += a[n];
+    for (; n < (unsigned)k; ++n) g++;
     return s;
 }
 int walks(int k) {
@@ -67,14 +69,30 @@ int may_exit(int y) {
     return g;
 }
 int calls_it(int y) { return may_exit(y) + 1; }
-int never_ends_at_top(int k) { // for 65535
-    unsigned i, limit = k;
-    for (i = 0; i <= limit; i++) g++;
+int never_ends_at_top(unsigned k) { // for 65535
+    unsigned i;
+    for (i = 0; i <= k; i++) g++;
     return g;
 }
-int skips_the_end(int k) { // for odd ones
+int skips_the_end(unsigned k) { // for odd ones
     unsigned i;
-    for (i = 0; i != (unsigned)k; i += 2) g++;
+    for (i = 0; i != k; i += 2) g++;
+    return g;
+}
+int skips_it_in_a_loop(unsigned k) {
+    unsigned i = 0;
+    int j;
+    do {
+        j = 0;
+        do {
+            a[j] ^= i++;
+        } while (++j < 2);
+    } while (i != k);
+    return g;
+}
+int runs_after_its_limit(unsigned k) {
+    unsigned i;
+    for (i = 0; i != k; i++) k += a[i & 15];
     return g;
 }
 int steps_now_and_then(int k) {
@@ -94,14 +112,25 @@ int other_variable(int k) {
     while (k != g) i++;
     return i;
 }
-int jumps_in(int k) {
-    int i = 0;
-    if (k) goto in;
-    for (; i < 9; i++) {
-    in:
-        if (a[i]) goto in;
-    }
+int has_its_address_taken(int k) {
+    int i, *p = k ? &i : &g;
+    for (i = 0; i < k; i++) *p -= 1;
     return i;
+}
+int steps_in_the_inner_loop(int k) {
+    int i = 0, j;
+    while (i < k)
+        for (j = 0; j < a[k & 15]; j++) i++;
+    return i;
+}
+int has_two_entries(int k) {
+    if (k) goto second;
+first:
+    if (!a[g & 15]) return g;
+second:
+    g++;
+    if (a[k & 15]) goto first;
+    return k;
 }
 int is_odd(int k);
 int is_even(int k) { return k ? is_odd(k - 1) : 1; }
@@ -147,6 +176,14 @@ LOOP(never_ends_at_top)
 // HAS: /_skips_the_end\(/
 // HAS: /x . y/
 LOOP(skips_the_end)
+// FUNCTION: in_skips_it_in_a_loop
+// HAS: /_skips_it_in_a_loop\(/
+// HAS: /x . y/
+LOOP(skips_it_in_a_loop)
+// FUNCTION: in_runs_after_its_limit
+// HAS: /_runs_after_its_limit\(/
+// HAS: /x . y/
+LOOP(runs_after_its_limit)
 // FUNCTION: in_steps_now_and_then
 // HAS: /_steps_now_and_then\(/
 // HAS: /x . y/
@@ -159,10 +196,18 @@ LOOP(steps_back)
 // HAS: /_other_variable\(/
 // HAS: /x . y/
 LOOP(other_variable)
-// FUNCTION: in_jumps_in
-// HAS: /_jumps_in\(/
+// FUNCTION: in_has_its_address_taken
+// HAS: /_has_its_address_taken\(/
 // HAS: /x . y/
-LOOP(jumps_in)
+LOOP(has_its_address_taken)
+// FUNCTION: in_steps_in_the_inner_loop
+// HAS: /_steps_in_the_inner_loop\(/
+// HAS: /x . y/
+LOOP(steps_in_the_inner_loop)
+// FUNCTION: in_has_two_entries
+// HAS: /_has_two_entries\(/
+// HAS: /x . y/
+LOOP(has_two_entries)
 // FUNCTION: in_is_even
 // HAS: /_is_even\(/
 // HAS: /x . y/

@@ -133,8 +133,11 @@ std::vector<struct LOOP*> loops_outer_first(struct LOOP* root) {
     std::vector<struct LOOP*> loops;
     loops.reserve(8); // most functions have fewer
     if (root) loops.push_back(root);
-    for (size_t i = 0; i < loops.size(); ++i)
-        for_each_subloop(loops[i], [&](struct LOOP* inner) { loops.push_back(inner); });
+    for (size_t i = 0; i < loops.size(); ++i) {
+        const struct LOOP* loop = loops[i];
+        for (const BBLK* bb : loop->contents)
+            if (bb->loop != loop) loops.push_back(bb->loop);
+    }
     return loops;
 }
 

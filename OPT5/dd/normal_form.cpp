@@ -383,7 +383,7 @@ NODE* denormalize(NODE* t, bool keep_ddnodes) {
 template <class F>
 void rewrite_statements(const F& rewrite) {
     for (BBLK* bb = currfuninfo->bb_list; bb; bb = bb->dflink)
-        for (LIST* s = bb->statements; s; s = s->rest) s->first = rewrite(s->first);
+        for (LIST* s = bb->statements; s; s = s->rest) put_operand(s->first, rewrite(s->first));
 }
 
 } // namespace

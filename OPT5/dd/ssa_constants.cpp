@@ -362,7 +362,7 @@ private:
         if (t->op == SSA_PHI || is_mark(t)) return;
         changed_here = false;
         line = s->psn ? s->psn->line : 0;
-        s->first = replace(t, false);
+        put_operand(s->first, replace(t, false));
         if (!changed_here) return;
         has_changed = true;
         note_changed_statement(s);
@@ -390,8 +390,8 @@ private:
                 return effects ? mk_COMMAOP(effects, value) : value;
             }
         if (reads_place(t)) t = with_known_operand(t);
-        t->left = replace(t->left, left_is_place(t) || (is_place && is_around_use(t)));
-        if (t->op != IF && t->op != SWITCH) t->right = replace(t->right, false); // labels
+        put_operand(t->left, replace(t->left, left_is_place(t) || (is_place && is_around_use(t))));
+        if (t->op != IF && t->op != SWITCH) put_operand(t->right, replace(t->right, false)); // labels
         // In normal form the constant terms of a pointer are in the subscript.
         if (trees_are_normalized && t->op == UMULT && (t->left->op == PLUS || t->left->op == PCONV))
             t->left = partition_pointer_under_UMULT(t->left, t);

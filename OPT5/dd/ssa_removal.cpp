@@ -14,7 +14,7 @@ NODE* remove_SSA_operators_in_tree(NODE* t) {
     }
     // Left chains in a loop: lists and sums lean left.
     for (NODE* n = t; n; n = n->left) {
-        n->right = remove_SSA_operators_in_tree(n->right);
+        put_operand(n->right, remove_SSA_operators_in_tree(n->right));
         while (n->left && op_is_SSA(n->left->op)) {
             NODE* below = n->left->left;
             erase_node(n->left);

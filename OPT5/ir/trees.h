@@ -138,6 +138,12 @@ void erase_tree_list(LIST* list);      // trees and cells
 void erase_tree_list_only(LIST* list); // cells
 void erase_tree_list_to_entry(LIST* list, LIST* entry);
 
+// For walks that rewrite few of the trees that they look at: a store of what is there already would send each node of a
+// large function back to memory.
+inline void put_operand(NODE*& operand, NODE* now) {
+    if (operand != now) operand = now;
+}
+
 // ---- Walking. `visit` sees every node, operands before the node that holds them.
 template <class F>
 void for_each_node(NODE* t, F&& visit) {
@@ -150,8 +156,8 @@ void for_each_node(NODE* t, F&& visit) {
 template <class F>
 NODE* rewrite_tree(NODE* t, F&& rewrite) {
     if (!t) return nullptr;
-    t->left = rewrite_tree(t->left, rewrite);
-    t->right = rewrite_tree(t->right, rewrite);
+    put_operand(t->left, rewrite_tree(t->left, rewrite));
+    put_operand(t->right, rewrite_tree(t->right, rewrite));
     return rewrite(t);
 }
 

@@ -95,9 +95,9 @@ NODE* subst_globals(NODE* tree, bool* changed) {
         if (left_is_place)
             subst_globals_in_address(tree->left, changed);
         else
-            tree->left = subst_globals(tree->left, changed);
+            put_operand(tree->left, subst_globals(tree->left, changed));
     }
-    tree->right = subst_globals(tree->right, changed);
+    put_operand(tree->right, subst_globals(tree->right, changed));
     return tree;
 }
 
@@ -340,8 +340,8 @@ NODE* SWEEP::subst(NODE* t) {
         return value;
     }
     const bool was_access = t->op == UMULT && t->left && t->left->op != UAND;
-    t->left = subst(t->left);
-    t->right = subst(t->right);
+    put_operand(t->left, subst(t->left));
+    put_operand(t->right, subst(t->right));
     return was_access ? access_by_name(t) : t;
 }
 

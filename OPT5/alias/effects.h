@@ -95,13 +95,13 @@ std::vector<const NODE*> lvalues_read_in(const NODE* tree);
 
 // ---- Control
 //
-// What may trap is not evaluated where the program does not: it stays behind what may not pass control on, for `if (!b)
-// exit(3);` comes ahead of a / b, and behind events outside the program, which others may see first or which never come.
-// A callee that may trap itself holds nothing back. Where it traps, the run has no defined end that an earlier trap would
-// change: the call is one of those that are certain to come back otherwise, and nothing outside sees what they do.
+// What may trap is evaluated only where the program evaluates it, or where it is certain to come to that. It so stays behind
+// whatever may not pass control on, as the check in `if (!b) exit(3); q = a / b;`, and behind events outside the program,
+// which may never come, or be the last that others see of it.
+// A callee that may trap is no such thing if it is certain to come back otherwise. A run in which it traps is undefined from
+// there on, and nothing that is defined lies between the place where the mover's trap comes now and that one.
 
-// Whether a CALL or UCALL comes back for certain, in finite time and without an event outside the program: then it is as an
-// assignment to what follows.
+// Whether a CALL or UCALL comes back for certain: in finite time, and with no event outside the program in between.
 bool call_surely_returns(const NODE* call);
 // One node, its operands and the callee of a call aside: an operation of the machine, but for those that multiply and
 // accumulate, assembly, or a volatile access.

@@ -8,9 +8,9 @@
 // Needs: SSA form, a hierarchy, alias marks, dominators. Leaves: those, with new statements in preheaders.
 // Sound because the definitions of the uses dominate the loop's head and nothing in the loop defines their variables:
 // memory that is read there has a may-definition wherever it may change. A load through a pointer, DIV and MOD move
-// only where each execution of the loop evaluates the expression in its first iteration, ahead of any call and of any
-// loop within, which may not return: `for (...) if (d) s += n / d` stays. What is not certain to be evaluated may be
-// computed though nobody asked: its signed operations wrap.
+// only where each execution of the loop evaluates the expression in its first iteration, ahead of any call that may not
+// return and of any loop within, which may not end: `for (...) if (d) s += n / d` stays. What is not certain to be
+// evaluated may be computed though nobody asked: its signed operations wrap.
 #include "OPT5/dd/ssa.h"
 #include "OPT5/dd/dd.h"
 

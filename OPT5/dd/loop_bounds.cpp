@@ -141,9 +141,6 @@ void refine_loop_highlow(struct LOOP* loop) {
 
 // ---- By subscripts
 
-namespace {
-
-// Innermost loops alone: one in it may never end.
 bool always_comes_to_its_end(const struct LOOP* loop) {
     if (loop->is_root()) return false;
     for (const BBLK* bb : loop->contents) {
@@ -153,6 +150,8 @@ bool always_comes_to_its_end(const struct LOOP* loop) {
     }
     return true;
 }
+
+namespace {
 
 class SUBSCRIPTS {
 public:

@@ -29,6 +29,10 @@ NODE* denormalized_copy(const NODE* tree);
 // loop, or what is known of the values, says.
 bool first_test_holds(const struct LOOP* loop);
 
+// Whether control comes from the head of each iteration to where the graph says. Of innermost loops alone: one in it may
+// never end (loop_bounds.cpp).
+bool always_comes_to_its_end(const struct LOOP* loop);
+
 // Adds a multiple of the tree to the sum, by operators alone that give the number itself; false where that has no room.
 bool read_exact_sum(const NODE* tree, int64_t coefficient, LINEAR_FORM* sum);
 

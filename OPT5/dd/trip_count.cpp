@@ -315,8 +315,8 @@ NODE* symbolic_count(const COUNTER& c, bool passes_on_entry) {
     OWNED_TREE t(distance_tree(c, passes_on_entry, more, &range));
     if (!t) return nullptr;
     const WIDE least = c.first_test() - (is_inclusive(c.op) ? 1 : 0);
-    const bool must_end =
-        !c.loop->has(LOOP_early_exit) && !c.loop->has(LOOP_has_call) && (c.is_pointer || c.type->is_signed());
+    const bool must_end = !c.loop->has(LOOP_early_exit) && (c.is_pointer || c.type->is_signed()) &&
+                          (!c.loop->has(LOOP_has_call) || always_comes_to_its_end(c.loop));
     if (range.min < least && !(c.op == NEQ && must_end)) return nullptr;
     if (range.max < least) return nullptr;
     if (c.op == NEQ && !must_end && !(max_ICON_factor(t.get(), loop) % to_int65(size)).is_zero()) return nullptr;

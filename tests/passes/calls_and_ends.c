@@ -229,6 +229,23 @@ LOOP(prints)
 // HAS: /x . y/
 LOOP(stops)
 
+// A signed counter reaches the limit that it is tested for, for it would overflow behind it, unless a call leaves the loop.
+#define UNTIL(callee)                                                                                                  \
+    int until_##callee(int i, int n) {                                                                                 \
+        do {                                                                                                           \
+            callee(i & 3);                                                                                             \
+            i += 2;                                                                                                    \
+        } while (i != n);                                                                                              \
+        return i;                                                                                                      \
+    }
+
+// FUNCTION: until_counts
+// COUNT 1: MUST_ITERATE("1", "32767", "1")
+UNTIL(counts)
+// FUNCTION: until_calls_it
+// COUNT 1: MUST_ITERATE("1", "32768", "1")
+UNTIL(calls_it)
+
 int main(void) {
     put_i16(caller(3));
     put_i16(indirect(caller, 4));
@@ -238,6 +255,7 @@ int main(void) {
     a[3] = 5;
     put_i16(in_counts(3, 7, 2) + in_walks(3, 7, 2) + in_by_pointer(3, 7, 2) + in_is_even(3, 7, 2) + in_waits(2, 7, 2));
     put_i16(in_prints(2, 7, 3));
+    put_i16(until_counts(2, 10));
     put_i16(in_calls_it(2, 7, zero)); // ends the program ahead of the quotient
     return 0;
 }

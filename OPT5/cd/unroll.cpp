@@ -230,7 +230,8 @@ bool unroll_counted_by_request(struct LOOP* loop, int factor) {
         refuse(loop, "its number of iterations is not known ahead of it");
         return false;
     }
-    if (info.unrolledSpaceCost + info.peeledIterationSpaceCost > MOST_REQUESTED_SPACE) {
+    if (factor > MOST_COPIES_OF_A_BODY ||
+        info.unrolledSpaceCost + info.peeledIterationSpaceCost > MOST_REQUESTED_SPACE) {
         refuse(loop, "it is too large for so many copies");
         return false;
     }

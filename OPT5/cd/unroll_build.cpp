@@ -69,6 +69,14 @@ bool UNROLLED_BODY::runs_always(const BBLK* bb) const {
     return bb == loop->head || bb == loop->tail || !reaches(0, place_of(loop->tail), place_of(bb));
 }
 
+// All steps of the copies together are a number of the type.
+static bool is_small_step(const VARIABLE_STEP& step) {
+    const TYPE* type = step.sym->type;
+    if (type->is_pointer() || type->is_unsigned()) return true;
+    const INT65 size = step.c.is_negative() ? -step.c : step.c;
+    return size <= int_type_max(step.sym->type->stqs()) / INT65(MOST_COPIES_OF_A_BODY);
+}
+
 void UNROLLED_BODY::find_steps() {
     std::unordered_map<const SYMTAB*, int> writes; // looked up
     for (size_t b = 0; b < blocks.size(); ++b)
@@ -81,7 +89,7 @@ void UNROLLED_BODY::find_steps() {
             const TYPE* type = v.step.sym->type;
             if (!is_private_scalar(v.step.sym) || type->is_volatile() || find_widened_symbol_entry(v.step.sym) ||
                 (!type->is_pointer() && !type->is_int()) || type->is_bool() || type->size > 32 ||
-                !runs_always(blocks[b]))
+                !is_small_step(v.step) || !runs_always(blocks[b]))
                 continue;
             const LOOPIV* iv = find_LOOPIV_for_IV(v.step.sym, loop, false);
             v.start_is_known = iv && iv->init && iv->init->op == ICON && type->is_int();

@@ -9,6 +9,8 @@
 
 struct LOOP;
 
+constexpr int MOST_COPIES_OF_A_BODY = 64;
+
 // A variable that one statement of the body steps by a constant in each iteration, and that nothing else writes. In
 // copies it is not stepped until the last: what reads it in between reads a sum.
 struct STEPPED {

@@ -24,7 +24,7 @@ HEADERS = [
     ("int", "for (v = 1; v < 38; v += 3)", 0), ("int", "v = a; if (v < b) @ do", 1), ("unsigned", "for (v = 65531u; v != 5; v++)", 0),
     ("int", "v = a; if (flag) v += k - 9; @ for (; v < b; v++)", 1), ("long", "v = a; if (flag) v += k - 9; @ for (; v > b; v -= 3)", -3),
     ("unsigned", "v = b; if (flag) v += k - 9; @ while (v--)", 1),
-    ("int", "for (v = 64; v; v >>= 2)", 0), ("unsigned", "for (v = 1; v < 3000; v *= 3)", 0),
+    ("int", "for (v = -30000; v < 23000; v += 9000)", 0), ("int", "for (v = 64; v; v >>= 2)", 0), ("unsigned", "for (v = 1; v < 3000; v *= 3)", 0),
 ]
 # `k` and `p` step as well; `t` is computed.
 BODIES = [

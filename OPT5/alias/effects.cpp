@@ -243,6 +243,11 @@ bool call_surely_returns(const NODE* call) {
     return f && TEST_FLAG(f, FUN_surely_returns) && !TEST_FLAG(f, FUN_never_returns);
 }
 
+bool call_only_computes(const NODE* call) {
+    if (!op_is_call(call->op) || !call_surely_returns(call)) return false;
+    return TEST_FLAG(find_FUNINFO_for_call(call), FUN_is_pure_fun | FUN_only_reads);
+}
+
 static bool node_may_not_pass_control(const NODE* t) {
     if (op_is_call(t->op)) return !call_surely_returns(t);
     return t->op == UMCALL || t->op == ASM || (t->op == MCALL && !is_multiply_accumulate_MCALL(t));

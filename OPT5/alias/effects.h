@@ -103,6 +103,8 @@ std::vector<const NODE*> lvalues_read_in(const NODE* tree);
 
 // Whether a CALL or UCALL comes back for certain: in finite time, and with no event outside the program in between.
 bool call_surely_returns(const NODE* call);
+// Whether nothing but its value, and what evaluating its arguments does, would be missed if a CALL or UCALL were not made.
+bool call_only_computes(const NODE* call);
 // One node, its operands and the callee of a call aside: an operation of the machine, but for those that multiply and
 // accumulate, assembly, or a volatile access.
 bool node_may_stop_or_wait(const NODE* t);

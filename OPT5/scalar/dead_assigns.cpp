@@ -1,4 +1,5 @@
-// Dead assignments: stores to a local that no path reads before the next store to it.
+// Dead assignments: stores to a local that no path reads before the next store to it. So are calls of functions that
+// compute and return for certain where no one takes what they give.
 //
 // One walk over each block against the order of evaluation, with the set of variables that are live at the point.
 // Variables that only die because an assignment was removed are found by the next call.
@@ -206,6 +207,7 @@ private:
         if (kills) live.clear(static_cast<uint32_t>(bit));
         return true;
     }
+    bool call(const NODE* t) override { return !call_only_computes(t) || !rewrite_is_allowed(t); }
     void removed() override { ++count; }
 
     BITVEC live;

@@ -52,6 +52,7 @@ NODE* BACKWARD_WALK::walk(NODE* t, bool discard) {
     case STREF: t->left = walk(t->left, false); return t;
     default: break;
     }
+    if (op_is_call(t->op) && discard && !call(t)) return walk_removed_call(t);
     if (op_of_opASG[t->op] != ILLOP) {
         if (!discard && !root) embedded_assignment();
         return walk_assignment(t, discard);
@@ -97,6 +98,14 @@ NODE* BACKWARD_WALK::without_store(NODE** assignment, bool discard) {
     *assignment = nullptr;
     removed();
     return rest;
+}
+
+NODE* BACKWARD_WALK::walk_removed_call(NODE* t) {
+    NODE* arguments = peel_for_effect(t->right);
+    t->right = nullptr;
+    erase_tree(t);
+    removed();
+    return walk(arguments, true);
 }
 
 NODE* BACKWARD_WALK::walk_conditional(NODE* t) {

@@ -23,12 +23,15 @@ protected:
     // An assignment to a candidate, before its right side is visited. False: it is dead, and the walk removes it but
     // for its effects and a value that is used.
     virtual bool write(int bit, bool kills) = 0;
+    // A call whose value is not used. False: the walk removes it but for the effects of its arguments.
+    virtual bool call(const NODE*) { return true; }
     virtual void removed() {}
     virtual void embedded_assignment() {} // one that is not the root of its statement
 
 private:
     NODE* walk(NODE* t, bool discard);
     NODE* walk_assignment(NODE* t, bool discard);
+    NODE* walk_removed_call(NODE* t);
     NODE* walk_conditional(NODE* t);
     NODE* without_store(NODE** assignment, bool discard);
     NODE* walk_commas(NODE* t, bool discard);

@@ -34,6 +34,32 @@ int counters(int* p, int n) {
     return kept;
 }
 
+// Calls of functions that compute and return for certain go, with calls that are their arguments; what acts in an argument
+// and what may stay away does not.
+static int square(int x) { return x * x; }
+static int sum(const int* p, int n) {
+    int s = 0;
+    for (int i = 0; i < n; ++i) s += p[i];
+    return s;
+}
+static int may_stay(int x) {
+    while (x & 1) x = x * 3 ^ 2;
+    return x;
+}
+
+// FUNCTION: idle
+// NOT: _square(
+// NOT: _sum(
+// COUNT 2: _step(
+// COUNT 1: _may_stay(
+int idle(const int* p, int a) {
+    int unused = square(square(a));
+    unused = sum(p, step(1) & 1);
+    square(step(2)) + (a > 3 && sum(p, a));
+    unused = may_stay(a);
+    return a;
+}
+
 // FUNCTION: conditional
 // HAS: x = 5
 int conditional(int y) {
@@ -103,6 +129,7 @@ int main(void) {
     put_i16(old_value(6));
     put_i16(not_past_a_read());
     put_i16(counters((int[]){4, 5, 6}, 3));
+    put_i16(idle((int[]){4, 5, 6}, 2));
     put_i16(g);
     return 0;
 }

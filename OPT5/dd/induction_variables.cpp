@@ -133,6 +133,24 @@ bool is_update_block(const BBLK* bb, const struct LOOP* loop, const INDUCTION_UP
            passes_diamond_test(bb, loop, statement->left);
 }
 
+// The signed number that a constant update adds.
+INT65 constant_amount(const INDUCTION_UPDATE& u) {
+    INT65 v = u.amount->u.lval;
+    if (!u.sym->type->is_pointer() && u.sym->type->is_unsigned()) v = sign_extend_by_type_size(v, u.sym->type);
+    return u.is_subtracted ? -v : v;
+}
+
+// Both where it is not known.
+uint64_t direction_of(const INDUCTION_UPDATE& u, struct LOOP* loop) {
+    const int sign = u.amount->op != ICON               ? (tree_is_positive(u.amount, loop)   ? (u.is_subtracted ? -1 : 1)
+                                                           : tree_is_negative(u.amount, loop) ? (u.is_subtracted ? 1 : -1)
+                                                                                              : 0)
+                     : constant_amount(u).sign < 0      ? -1
+                     : constant_amount(u) == INT65(0) ? 0
+                                                        : 1;
+    return sign > 0 ? IV_increases : sign < 0 ? IV_decreases : (IV_increases | IV_decreases);
+}
+
 class CANDIDATES {
 public:
     explicit CANDIDATES(struct LOOP* of) : loop(of) {}
@@ -158,7 +176,13 @@ private:
         INDUCTION_UPDATE u;
         const bool is_update = !loop->is_root() && is_induction_update(t, &u) && may_be_IV(u, loop) &&
                                !is_optimizer_temp(u.sym->name, 'h', 'i') && is_update_block(bb, loop, u, t);
-        if (is_update && seen.insert(u.sym).second) in_order.push_back(u.sym);
+        if (is_update) {
+            const uint64_t direction = direction_of(u, loop);
+            const auto [found, is_first] = directions.emplace(u.sym, direction);
+            if (is_first) in_order.push_back(u.sym);
+            // One that goes back and forth leaves its bounds between the updates, or wraps there.
+            if (!is_first && (found->second | direction) == (IV_increases | IV_decreases)) altered.insert(u.sym);
+        }
         const bool is_prolog = tree_is_extended_arg_prolog(t, first);
         for_each_written_name(t, [&](const NODE* name, const NODE* by) {
             if (!(is_update && by == t) && !is_prolog) altered.insert(name->u.sym);
@@ -166,7 +190,7 @@ private:
     }
 
     struct LOOP* loop;
-    SYM_SET seen;
+    std::unordered_map<const SYMTAB*, uint64_t> directions; // looked up alone
     std::vector<SYMTAB*> in_order;
 };
 
@@ -205,28 +229,13 @@ private:
             if (!is_induction_update(s->first, &u) || u.sym != iv->sym) continue;
             iv->flags |= where;
             if (u.is_narrowed) iv->flags = (iv->flags | IV_narrowed) & ~uint64_t(IV_affine);
-            enter_direction(u);
+            iv->flags |= direction_of(u, loop);
             add(u);
         }
     }
-    void enter_direction(const INDUCTION_UPDATE& u) {
-        const int sign = u.amount->op == ICON && amount_of(u).sign < 0 ? -1
-                         : u.amount->op == ICON                        ? (amount_of(u) == INT65(0) ? 0 : 1)
-                         : tree_is_positive(u.amount, loop)            ? (u.is_subtracted ? -1 : 1)
-                         : tree_is_negative(u.amount, loop)            ? (u.is_subtracted ? 1 : -1)
-                                                                       : 0;
-        iv->flags |= sign > 0 ? IV_increases : sign < 0 ? IV_decreases : (IV_increases | IV_decreases);
-    }
-    // The signed number that a constant update adds.
-    INT65 amount_of(const INDUCTION_UPDATE& u) const {
-        INT65 v = u.amount->u.lval;
-        if (!iv->sym->type->is_pointer() && iv->sym->type->is_unsigned())
-            v = sign_extend_by_type_size(v, iv->sym->type);
-        return u.is_subtracted ? -v : v;
-    }
     void add(const INDUCTION_UPDATE& u) {
         if (u.amount->op == ICON && !iv->incrtree) {
-            constant = constant + amount_of(u);
+            constant = constant + constant_amount(u);
             return;
         }
         TYPE* type = iv->sym->type->is_pointer() ? tp->long_t : iv->sym->type->stqs();

@@ -280,6 +280,7 @@ private:
         cell->flag2 = first->flag2;
         cell->rest = first->rest;
         control_of(bb) = control_of(next) == first ? cell : control_of(next);
+        bb->control = control_of(bb); // the cell may be dropped now, as a promise
         delete first;
         control_of(next) = nullptr;
         set_statements(next, nullptr);

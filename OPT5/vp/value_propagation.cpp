@@ -233,7 +233,7 @@ void VALUE_SETS::read_graph(bool with_loops) {
         find_origins(&blocks[i]);
         if (const struct LOOP* loop = order[i]->loop; with_loops && loop && loop->head == order[i] && !loop->is_root())
             for (const auto& iv : loop->IVs)
-                if (vpset course; vpenv_store->number_of(iv->sym) >= 0 && find_vpset_in_LOOPIV(&course, iv->sym, loop))
+                if (vpset course; vpenv_store->number_of(iv->sym) >= 0 && find_vpset_in_LOOPIV(&course, iv->sym, loop, true))
                     blocks[i].courses.emplace_back(vpenv_store->number_of(iv->sym), course);
     }
     for (size_t i = 0; i < order.size(); ++i)

@@ -580,7 +580,7 @@ VP_EFFECT::VP_EFFECT(const NODE* statement, const struct LOOP* loop) : tree(stat
                 target = -1;
                 break;
             }
-    if (vpset s; target >= 0 && loop && find_vpset_in_LOOPIV(&s, vpenv_store->symbol(target), loop))
+    if (vpset s; target >= 0 && loop && find_vpset_in_LOOPIV(&s, vpenv_store->symbol(target), loop, false))
         course = std::make_unique<vpset>(s);
 }
 

@@ -47,8 +47,9 @@ private:
 };
 
 // ---- vp_loops.cpp
-// What an induction variable of the loop may be at any point of it; false where that is nothing new.
-bool find_vpset_in_LOOPIV(vpset* out, const SYMTAB* sym, const struct LOOP* loop);
+// What an induction variable of the loop may be at any point of it, or, which is less, where an iteration begins; false
+// where that is nothing new.
+bool find_vpset_in_LOOPIV(vpset* out, const SYMTAB* sym, const struct LOOP* loop, bool at_head);
 // The predicates of the set, which the symbol has in the loop, which does not change it, as assertions of the outermost
 // loop of which the same holds. How many they are.
 int insert_vpset_binding_in_loop(const vpset& set, SYMTAB* sym, struct LOOP* loop);

@@ -14,14 +14,15 @@
 #include "OPT5/ir/type_ops.h"
 #include "OPT5/simp/simp.h"
 
-bool find_vpset_in_LOOPIV(vpset* out, const SYMTAB* sym, const struct LOOP* loop) {
+bool find_vpset_in_LOOPIV(vpset* out, const SYMTAB* sym, const struct LOOP* loop, bool at_head) {
     const LOOPIV* iv = loop && !loop->is_root() ? find_LOOPIV_for_IV(sym, loop, false) : nullptr;
     if (!iv || !iv->has(IV_affine) || !has_value_range(sym->type) || sym->type->is_enum() || sym->type->is_bool()) return false;
     const RANGE limits = range_of_type(sym->type);
     const WIDE low = std::max(to_wide(iv->lowval), limits.min), high = std::min(to_wide(iv->highval), limits.max);
     if (low > high) return false;
     VPSLICE grid{low, high, 1};
-    if (iv->init && iv->init->op == ICON && iv->incrtree && iv->incrtree->op == ICON) {
+    // Between two updates it is off the grid.
+    if (at_head && iv->init && iv->init->op == ICON && iv->incrtree && iv->incrtree->op == ICON) {
         const WIDE by = to_wide(sign_extend_by_type_size(iv->incrtree->u.lval, iv->incrtree->type)),
                    step = by < 0 ? -by : by, from = to_wide(truncate_to_type(iv->init->u.lval, sym->type));
         if (step > 0) grid = {from, from + step, step};

@@ -238,6 +238,34 @@ int by_nothing(int n) {
     return n;
 }
 
+// Between two updates a variable is not where iterations begin: off their grid, and beyond where they begin if it goes
+// back and forth, also by wrapping.
+unsigned stepped_twice(void) {
+    unsigned i, n = 0;
+    for (i = 0; i < 10; i++) {
+        n += 1;
+        h++;
+        n += 2;
+    }
+    return n;
+}
+
+unsigned back_and_forth(void) {
+    int i, n = 0;
+    unsigned k;
+    for (i = 0; i < 10; i++) {
+        i += 3;
+        if (i > 11) n += 1;
+        i -= 3;
+    }
+    for (k = 20; k > 9;) {
+        k -= 12;
+        if (k > 60000u) n += 100;
+        k += 10;
+    }
+    return n + k;
+}
+
 // Over all that an int holds.
 static unsigned sum_of_all(int (*f)(int)) {
     unsigned sum = 0;
@@ -255,6 +283,7 @@ int main(void) {
     put_u32(sum_of_all(other));
     for (i = 0; i < 100; i++) x[i] = i * 7;
     put_i16(accumulated() + h);
+    put_i16(stepped_twice() + back_and_forth());
     for (i = 0; i < 14; i++) put_i16(doubled(i));
     put_i16(wrapped(65530u));
     put_i16(wrapped(12));

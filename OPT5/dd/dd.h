@@ -36,6 +36,8 @@ PSN place_of_loop(const struct LOOP* loop); // in the source; its line is 0 wher
 bool sink_unused_definitions(struct LOOP* loop);
 // Places that innermost loops write, and whose address stays, get pointers of their own (invariant_places.cpp).
 void name_invariant_places(struct LOOP* root);
+// Quotients and remainders of counters by what their loops leave alone step as well (stepping_quotients.cpp).
+void count_quotients(struct LOOP* root);
 void undeltafy_dd_loops(struct LOOP* loop);
 void collapse_dd_loops(struct LOOP* loop);
 void coalesce_dd_loops(struct LOOP* loop);

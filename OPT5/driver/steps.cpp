@@ -221,6 +221,7 @@ void collapse_loops() {
 void circular_addressing() {
     sr_circular_addressing_in_loop(root());
     sr_DIV_and_MOD_in_loop(root(), true);
+    count_quotients(root());
 }
 
 void loop_if_interchange() {
@@ -293,7 +294,7 @@ const ROW steps[] = {
     /* 36 */ {L, "undeltafy", &D, L2, [] { undeltafy_dd_loops(root()); }, none, none},
     /* 37 */ {L, "add_downcounters", &D, L2, [] { with_hierarchy([] { add_downcounters_to_loops(root(), true, true); }); }, none, none},
     /* 38 */ {L, "collapse_loops", &D, L2, [] { with_hierarchy(collapse_loops); }, none, none},
-    /* 39 */ {L, "circular_addressing", &D, L2, circular_addressing, none, none},
+    /* 39 */ {F, "circular_addressing", &D, L2_with_loops, [] { with_hierarchy(circular_addressing); }, none, graph | alias_marks},
     /* 40 */ {L, "loop_if_interchange", &D_with_dependence, L2, loop_if_interchange, none, none},
     /* 41 */ {F, "cd_unroll_by_request", &D, L2_with_loops, [] { with_hierarchy(unroll_by_request); }, none, graph | alias_marks},
     /* 42 */ {F, "DMAC_conversion", &D, L2_with_loops_on_dual_hardware, [] { with_hierarchy(DMAC_conversion); }, none, graph | alias_marks},

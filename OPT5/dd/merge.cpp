@@ -39,6 +39,7 @@
 #include <map>
 #include <unordered_map>
 #include <unordered_set>
+#include <utility>
 
 namespace {
 
@@ -191,6 +192,7 @@ private:
     void map_test(const LOOP_TEST& test);
     NODE* last_address(const LOOP_TEST& test, const GROUP& g);
     void remove_counter(const INDUCTION& i);
+    void remove_idle_steps();
     NODE* start_tree(const GROUP& g);
     void report(const GROUP& g, int n);
 
@@ -651,6 +653,24 @@ void MERGE::remove_counter(const INDUCTION& i) {
     remove_statement(ahead, i.start_statement);
 }
 
+// A variable that pointers took the place of may be read by its own steps alone.
+void MERGE::remove_idle_steps() {
+    for (const INDUCTION* i : facts.all_inductions()) {
+        const bool was_replaced = std::any_of(groups.begin(), groups.end(), [i](const GROUP& g) {
+            return g.steps && g.address.is_induction_by(i->sym);
+        });
+        if (!was_replaced || (mapped && mapped->counter == i) || facts.is_used_after(i->sym)) continue;
+        int reads = 0;
+        auto count = [&reads, i](const NODE* t) { reads += t->op == NAME && t->u.sym == i->sym; };
+        for (const BBLK* bb : loop->blocks)
+            for (const LIST* s = bb->statements; s; s = s->rest) for_each_node(s->first, count);
+        const int all = std::exchange(reads, 0);
+        for (const INDUCTION::STEP& step : i->steps) for_each_node(step.statement, count);
+        if (reads != all) continue;
+        for (const INDUCTION::STEP& step : i->steps) remove_statement(step.bb, step.statement);
+    }
+}
+
 void MERGE::run() {
     if (!facts.is_usable() || facts.all_inductions().empty()) return;
     groups = COLLECTOR(loops, loop, facts).groups();
@@ -674,9 +694,11 @@ void MERGE::run() {
             rewrite_with_base(g);
         if (g.steps) note_sweep(g);
     }
-    if (!mapped) return;
-    map_test(*mapped);
-    remove_counter(*mapped->counter);
+    if (mapped) {
+        map_test(*mapped);
+        remove_counter(*mapped->counter);
+    }
+    remove_idle_steps();
 }
 
 } // namespace

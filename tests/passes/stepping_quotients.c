@@ -37,6 +37,17 @@ int phases(const int* x, int n, int phases) {
     return sum;
 }
 
+// Where a pointer takes the place of the quotient, that does not step.
+// FUNCTION: strided
+// HAS: $O$q0 = i / d
+// COUNT 0: q0 +=
+int strided(const int* x, int n, int d) {
+    int i, k, all = 0;
+    for (i = 0; i < d; i++)
+        for (k = i; k < n; k += d) all ^= x[40 - k / d];
+    return all;
+}
+
 // ---- These divide: the divisor may be negative, or the counter; it steps by another number, or twice, or changes; or what
 // is asked for is asked for seldom.
 
@@ -89,7 +100,7 @@ int nested(int n, int d) {
     return sum;
 }
 
-int x[40];
+int x[41];
 
 int main(void) {
     int n, d;
@@ -99,7 +110,7 @@ int main(void) {
             if (d == 0) continue;
             every(n, d);
             put_i16(by_two(n, d < 0 ? -d : d) + seldom(n, d) + nested(n, d));
-            put_i16(phases(x, n, d) + (d > 0 ? unknown_sign(-9, n, d) : unknown_sign(n, 0, d)));
+            put_i16(phases(x, n, d) + strided(x, n, d) + (d > 0 ? unknown_sign(-9, n, d) : unknown_sign(n, 0, d)));
             put_i32(every_unsigned((unsigned)n, (unsigned)d));
         }
     every(2, -32767 - 1);

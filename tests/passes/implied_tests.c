@@ -55,6 +55,24 @@ void joined(int x, int y) {
     g += h;
 }
 
+int amount = 5;
+
+// Iterations that stand one behind the other, of a loop of which something is promised: their blocks become one.
+// FUNCTION: by_trial
+// NOT: goto
+// HAS: /return t \+ 128/
+unsigned by_trial(void) {
+    unsigned t = 1, i;
+    for (i = 8; i <= 100; i = i * 2) {
+        if (i & 4)
+            t += 3;
+        else
+            t -= i;
+        t += amount;
+    }
+    return t + i;
+}
+
 int main(void) {
     for (int i = -1; i < 9; i++) {
         g = h = 0;
@@ -72,5 +90,6 @@ int main(void) {
     v = 1;
     twice_volatile();
     put_i16(h);
+    put_i16(by_trial());
     return 0;
 }

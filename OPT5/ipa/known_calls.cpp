@@ -32,6 +32,9 @@ void drop_synonyms() {
 } // namespace
 
 bool enter_formals() {
+    // Once for the file: calls may have lost arguments since.
+    for (const FUNLIST* p = program.funlist; p; p = p->next)
+        if (!p->fun->formals.empty()) return false;
     for (const FUNLIST* p = program.funlist; p; p = p->next) {
         FUNINFO* f = p->fun;
         if (!is_entered_by_name_alone(f)) continue;

@@ -108,7 +108,7 @@ bool call_only_computes(const NODE* call);
 // One node, its operands and the callee of a call aside: an operation of the machine, but for those that multiply and
 // accumulate, assembly, or a volatile access.
 bool node_may_stop_or_wait(const NODE* t);
-// Whether control may not come to what follows evaluating the tree.
+// Whether control may not come to what follows evaluating the tree. A volatile access passes it on.
 bool may_not_pass_control(const NODE* tree);
 // The same, or an event outside the program is part of it: what may trap does not move ahead of it, and stores ahead of it
 // are made.

@@ -119,15 +119,8 @@ void unroll(LOOP_UNROLLING_INFO& info, bool peeled, UNROLLED_BODY& body) {
     }
     if (!peeled)
         body.unroll(factor);
-    else {
+    else
         body.unroll(factor, info.rest());
-        // The factor of the count is none of that of the copies.
-        const INT65 u(factor);
-        if (is_icon(loop->tripFactor) && !(loop->tripFactor->u.lval % u).is_zero()) {
-            erase_tree(loop->tripFactor);
-            loop->tripFactor = nullptr;
-        }
-    }
     update_pragmas_for_loop(loop, factor);
 }
 
@@ -169,13 +162,7 @@ std::vector<struct LOOP*> innermost_loops() {
     return loops;
 }
 
-// Of a constant: what the division becomes later may be in a loop of any kind.
-bool division_disappears(const NODE* division) {
-    return division->type->is_int() && division->right->op == ICON && !division->right->u.lval.is_zero();
-}
-
 bool has_work() {
-    unrolling_callbacks.division_disappears = division_disappears;
     return loop_root() && opt_level() >= 2 && !currfuninfo->saves_environment &&
            !currfuninfo->bb_list->is_in_LIR_form();
 }

@@ -16,7 +16,6 @@
 #include "OPT5/dd/loop.h"
 #include "OPT5/ir/funinfo.h"
 #include "OPT5/ir/global.h"
-#include "OPT5/ir/live_sets.h"
 #include "OPT5/ir/opcodes.h"
 #include "OPT5/ir/statements.h"
 #include "OPT5/ir/trees.h"

@@ -60,5 +60,5 @@ private:
 };
 
 // No calls, no early end, a preheader; each statement may be in an unrolled loop, and the target has nothing better.
-// `requested`: the target is not asked. Otherwise `*why` says what is in the way.
+// `requested`: the target is not asked. Where the answer is no, `*why`, if it is not null, says what is in the way.
 bool loop_is_OK_for_unrolling(struct LOOP* loop, bool requested, std::string* why);

@@ -126,7 +126,9 @@ void refine_loop_highlow(struct LOOP* loop) {
                        far_end = up ? IV_high_is_exact : IV_low_is_exact;
         constrain(iv, r, is_constant ? near_end | (is_icon(loop->trips) ? far_end : 0) : 0);
     }
-    if (limit && first_test_holds(loop) && loop->test != EQ) {
+    // A test for != keeps the variable on this side of the limit where it comes to meet it.
+    const bool is_kept = loop->test == NEQ ? type->is_signed() && always_comes_to_its_test(loop) : loop->test != EQ;
+    if (limit && is_kept && first_test_holds(loop)) {
         const WIDE more = overshoot(loop->test, up ? *step : -*step);
         RANGE r{to_wide(int_type_min(type)), to_wide(int_type_max(type))};
         (up ? r.max : r.min) = up ? std::min(r.max, limit->max + more) : std::max(r.min, limit->min - more);
@@ -141,14 +143,26 @@ void refine_loop_highlow(struct LOOP* loop) {
 
 // ---- By subscripts
 
-bool always_comes_to_its_end(const struct LOOP* loop) {
-    if (loop->is_root()) return false;
-    for (const BBLK* bb : loop->contents) {
-        if (bb->loop != loop) return false;
-        for (const LIST* s = bb->statements; s; s = s->rest)
-            if (may_not_pass_control(s->first) || tree_contains_op(s->first, ASSERT)) return false;
-    }
+namespace {
+
+bool passes_control(const BBLK* bb) {
+    for (const LIST* s = bb->statements; s; s = s->rest)
+        if (may_not_pass_control(s->first) || tree_contains_op(s->first, ASSERT)) return false;
     return true;
+}
+
+} // namespace
+
+bool always_comes_to_its_end(const struct LOOP* loop) {
+    return !loop->is_root() && std::all_of(loop->contents.begin(), loop->contents.end(), [loop](const BBLK* bb) {
+        return bb->loop == loop && passes_control(bb);
+    });
+}
+
+bool always_comes_to_its_test(const struct LOOP* loop) {
+    return !loop->is_root() && std::all_of(loop->contents.begin(), loop->contents.end(), [loop](const BBLK* bb) {
+        return bb->loop == loop ? passes_control(bb) : bb->loop->trips && always_comes_to_its_test(bb->loop);
+    });
 }
 
 namespace {

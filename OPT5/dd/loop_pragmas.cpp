@@ -502,7 +502,9 @@ void reinsert_loop_pragmas(struct LOOP* loop) {
 void update_pragmas_for_loop(struct LOOP* loop, int factor) {
     const INT65 f = factor;
     loop->unrollAmount = static_cast<uint16_t>(loop->unrollAmount * factor);
-    // All counts are multiples of the factor, but perhaps not their bounds.
+    // All counts are multiples of the factor, but perhaps not their bounds; the factor of a count with a rest is none of that of
+    // the copies.
+    if (is_icon(loop->tripFactor) && !(loop->tripFactor->u.lval % f).is_zero()) erase_field(&loop->tripFactor);
     for (NODE* LOOP::*field : {&LOOP::trips, &LOOP::tripFactor, &LOOP::maxTrips, &LOOP::minTrips})
         if (is_icon(loop->*field))
             set_icon(&(loop->*field), (loop->*field)->u.lval / f);

@@ -32,6 +32,9 @@ bool first_test_holds(const struct LOOP* loop);
 // Whether control comes from the head of each iteration to where the graph says. Of innermost loops alone: one in it may
 // never end (loop_bounds.cpp).
 bool always_comes_to_its_end(const struct LOOP* loop);
+// The same of a loop with loops in it that are counted: a test for != in it is not left out by what never comes back, so
+// that a signed counter meets the limit, or overflows.
+bool always_comes_to_its_test(const struct LOOP* loop);
 
 // Adds a multiple of the tree to the sum, by operators alone that give the number itself; false where that has no room.
 bool read_exact_sum(const NODE* tree, int64_t coefficient, LINEAR_FORM* sum);

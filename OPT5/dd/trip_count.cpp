@@ -316,7 +316,7 @@ NODE* symbolic_count(const COUNTER& c, bool passes_on_entry) {
     if (!t) return nullptr;
     const WIDE least = c.first_test() - (is_inclusive(c.op) ? 1 : 0);
     const bool must_end = !c.loop->has(LOOP_early_exit) && (c.is_pointer || c.type->is_signed()) &&
-                          (!c.loop->has(LOOP_has_call) || always_comes_to_its_end(c.loop));
+                          always_comes_to_its_test(c.loop);
     if (range.min < least && !(c.op == NEQ && must_end)) return nullptr;
     if (range.max < least) return nullptr;
     if (c.op == NEQ && !must_end && !(max_ICON_factor(t.get(), loop) % to_int65(size)).is_zero()) return nullptr;

@@ -420,7 +420,9 @@ bool add_coefficient(const NODE* t, const SYMTAB* x, uint64_t width, uint64_t by
     const bool is_widened = t->op == SCONV && t->left->op == NAME && is_exact_by_rule(PLUS, t->left->type);
     const NODE* name = is_widened && t->left->type->size < width ? t->left : t;
     if (!t->type->is_int() || t->type->is_bool() || t->type->size != width) return false;
-    if (t->op == SCONV && t->left->op != NAME && !t->left->type->is_unsigned()) return false; // may have to wrap
+    // What stands below these does not become unsigned with the sum (as_wrapping), and may have to wrap.
+    const bool keeps_operand = t->op == SCONV || t->op == NOTB || t->op == SLL;
+    if (keeps_operand && t->left->op != NAME && !t->left->type->is_unsigned()) return false;
     if (name->op == NAME) {
         *sum += by;
         return name->type->stqs() == x->type->stqs();
@@ -510,7 +512,7 @@ void ANNOTATOR::read_value(NODE* assignment) {
 }
 
 // x op= constant, or x = x op constant.
-bool is_step(const NODE* t, uint64_t* amount) {
+bool adds_constant(const NODE* t, uint64_t* amount) {
     if ((!is_operator_assignment(t) && t->op != ASG) || !t->right) return false;
     if (!is_private_name(t->left) || !t->left->type->is_int()) return false;
     const SYMTAB* x = t->left->u.sym;
@@ -530,7 +532,7 @@ void ANNOTATOR::statement(BBLK* bb, LIST* s, int at) {
     known.clear();
     NODE* t = s->first;
     enter_writes(bb, t, at);
-    if (uint64_t amount = 0; is_step(t, &amount)) variable_steps[t->left->u.sym].push_back({bb->dfn, at, s, amount});
+    if (uint64_t amount = 0; adds_constant(t, &amount)) variable_steps[t->left->u.sym].push_back({bb->dfn, at, s, amount});
     if (!reads_come_first(t)) {
         if (mixed.enter(t)) for_each_read_of_mixed(t, reader());
         return mixed.clear();

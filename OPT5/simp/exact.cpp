@@ -8,7 +8,7 @@ using namespace rules;
 
 namespace {
 
-constexpr int MOST_LEVELS = 16;
+constexpr int MOST_LEVELS = 64;
 
 bool is_wrapping_operator(int op) { return op == PLUS || op == MINUS || op == MULT || op == UMINUS; }
 

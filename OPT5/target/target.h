@@ -43,13 +43,6 @@ INT65 loop_unrolling_factor(const LIST* statements, INT65 count);
 
 bool tree_is_OK_for_unrolling(const NODE* stmt);
 
-// What unrolling asks of the room that knows divisions; null until it is there, where none disappears.
-struct UNROLLING_CALLBACKS {
-    bool (*division_disappears)(const NODE* division) =
-        nullptr; // it becomes other operators, which may all be unrolled
-};
-extern UNROLLING_CALLBACKS unrolling_callbacks;
-
 // ---- What a register allocator asks of the target; nothing to do here
 void find_target_conflicts(NODE* t, BITVEC* live, BITVEC* conflicts, long index);
 void mark_live_across_call(BITVEC* live, NODE* call);

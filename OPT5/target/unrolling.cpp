@@ -16,7 +16,6 @@
 #include <algorithm>
 #include <cstring>
 
-UNROLLING_CALLBACKS unrolling_callbacks;
 
 namespace {
 
@@ -39,6 +38,11 @@ bool is_call_to_repeat(const NODE* t) {
            std::any_of(std::begin(names), std::end(names), [t](const char* name) { return !strcmp(t->u.name, name); });
 }
 
+// A division by a constant does later on, and those may all be unrolled.
+bool becomes_other_operators(const NODE* division) {
+    return division->type->is_int() && division->right->op == ICON && !division->right->u.lval.is_zero();
+}
+
 // Whether each operator of a statement may stand in an unrolled loop.
 bool node_is_OK_for_unrolling(const NODE* t) {
     if (t->type->is_float() && !has_hardware_float()) return false;
@@ -48,7 +52,7 @@ bool node_is_OK_for_unrolling(const NODE* t) {
     case CALL:
     case UCALL: return false;
     case DIV:
-    case MOD: return unrolling_callbacks.division_disappears && unrolling_callbacks.division_disappears(t);
+    case MOD: return becomes_other_operators(t);
     case ASM: return tree_is_ASM_comment(t);
     case ASG:
         if (t->type->is_vector() && t->left->op != NAME) return false;

@@ -246,7 +246,40 @@ UNTIL(counts)
 // COUNT 1: MUST_ITERATE("1", "32768", "1")
 UNTIL(calls_it)
 
+// ---- A counter that is tested by != meets no limit that it has passed: the program ends in a call, and a loop in it may
+// stay for ever.
+
+// FUNCTION: passes_its_limit
+// COUNT 1: a >= 4
+int quits;
+void quit(void) {
+    if (quits++ == 3) exit(9);
+}
+int passes_its_limit(int a) {
+    int s = 0;
+    while (a != 3) {
+        s += a > 3;
+        if (a >= 4) put_i16(a);
+        quit();
+        a += 2;
+    }
+    return s;
+}
+
+// FUNCTION: waits_for_ever
+// COUNT 1: _lamp
+volatile int door, lamp;
+void waits_for_ever(int a) {
+    while (a != 3) {
+        if (a == 100) {
+            while (door) lamp = a;
+        }
+        a += 2;
+    }
+}
+
 int main(void) {
+    if (zero) waits_for_ever(passes_its_limit(10));
     put_i16(caller(3));
     put_i16(indirect(caller, 4));
     stop(4);

@@ -99,6 +99,17 @@ long goes_along_in_one_arm(int n, int k) {
     return s;
 }
 
+// Below a complement the product would not wrap: it is made where the program makes it.
+// FUNCTION: complement
+// COUNT 2: * 5
+void complement(int i, int n) {
+    if (n == 3) use(~(i * 5));
+    for (int j = 0; j < n; j++) {
+        i -= 6000;
+        use(~(i * 5));
+    }
+}
+
 // A displacement that no access has room for is added once; one that it has belongs to it.
 int far[40000];
 // FUNCTION: out_of_reach
@@ -301,6 +312,7 @@ int main(void) {
     put_i16(divides_by_call(5, 2)); put_i16(divides_by_call(0, 0));
     for (c = 1; c < 7; c++) { put_i16(beside_effects(c, 3, c & 3, buffer)); put_i16(cell + buffer[0]); }
     for (c = 1; c < 7; c++) { put_i16(beside_other_effects(c, 3, c)); put_i16(beside_other_effects(9 * c, 3, 4)); }
+    complement(7000, 2);
     put_i16(goes_along(1, 6, 32740)); put_i16(goes_along(-3, 4, -7)); put_i16(hits);
     put_i32(goes_along_in_one_arm(8, 900)); put_i32(goes_along_in_one_arm(0, 900));
     put_i16(out_of_reach(9)); put_i16(far[35000]);

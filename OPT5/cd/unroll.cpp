@@ -30,8 +30,6 @@ namespace {
 constexpr int MOST_CONDX_COPIES = 63;
 constexpr uint64_t MOST_REQUESTED_SPACE = 4000;
 
-bool is_icon(const NODE* t) { return t && t->op == ICON; }
-
 // ---- What the programmer is told
 
 void tell(const char* format, ...) __attribute__((format(printf, 1, 2)));
@@ -128,7 +126,7 @@ void unroll(LOOP_UNROLLING_INFO& info, bool peeled, UNROLLED_BODY& body) {
 
 // ---- Completely
 
-bool cd_condx_unroll_loop_completely(struct LOOP* loop, bool told) {
+bool cd_condx_unroll_loop_completely(struct LOOP* loop) {
     const int64_t requested = requested_factor(loop);
     if (!may_be_looked_at(loop) || loop->has(LOOP_early_exit) ||
         !loop_is_OK_for_unrolling(loop, requested > 0, nullptr))
@@ -147,7 +145,7 @@ bool cd_condx_unroll_loop_completely(struct LOOP* loop, bool told) {
     info.characterize_body(body);
     info.unrolledCompletely = true;
     info.characterize_unrolled_loop(n.fits_in<int32_t>(), static_cast<int>(requested), false);
-    if (!info.unrolling_completely_wins(told) || !rewrite_is_allowed(loop->tail->branch())) return false;
+    if (!info.unrolling_completely_wins() || !rewrite_is_allowed(loop->tail->branch())) return false;
     unroll(info, false, body);
     return true;
 }
@@ -182,7 +180,7 @@ bool cd_unroll_inner_loops_completely() {
     if (print_debug) debug_printf("\n\t\t ----- ENTERING cd_unroll_inner_loops_completely() -----\n");
     bool any = false;
     if (!has_work()) return false;
-    for (struct LOOP* loop : innermost_loops()) any |= cd_condx_unroll_loop_completely(loop, true);
+    for (struct LOOP* loop : innermost_loops()) any |= cd_condx_unroll_loop_completely(loop);
     return finish(any);
 }
 
@@ -205,7 +203,7 @@ bool unroll_counted_by_request(struct LOOP* loop, int factor) {
         refuse(loop, why);
         return false;
     }
-    if (cd_condx_unroll_loop_completely(loop, false)) return true;
+    if (cd_condx_unroll_loop_completely(loop)) return true;
     UNROLLED_BODY body(loop);
     LOOP_UNROLLING_INFO info(loop);
     info.characterize_body(body);

@@ -322,24 +322,17 @@ void UNROLLED_BODY::unroll_completely(int count) {
 
 namespace {
 
-TYPE* unsigned_twin(TYPE* type) {
-    if (type->is_unsigned()) return type;
-    for (TYPE* u : {tp->uint_t, tp->ulong_t, tp->ullong_t})
-        if (u->size == type->size) return u;
-    return tp->ullong_t;
-}
-
 // The largest multiple of the factor that is not above the count; `trips` is borrowed.
 NODE* rounded_down(const NODE* trips, int factor) {
     TYPE* type = trips->type->stqs();
-    if ((factor & (factor - 1)) == 0) return maketree(ANDB, copy_tree(trips), mk_ICON(INT65(-factor), type), type);
+    if (power_of_2(INT65(factor)) >= 0) return maketree(ANDB, copy_tree(trips), mk_ICON(INT65(-factor), type), type);
     NODE* over = maketree(MOD, copy_tree(trips), mk_ICON(INT65(factor), type), type);
     return maketree(MINUS, copy_tree(trips), over, type);
 }
 
 } // namespace
 
-// What the control variable holds behind the last full round: it is on its course between the value on entry and the
+// What the control variable holds behind the last iteration of copies: it is on its course between the value on entry and the
 // one that it has at last, whatever its type; the sum is made in one that wraps.
 NODE* UNROLLED_BODY::main_loop_end(const NODE* trips, int factor) {
     SYMTAB* counter = loop->LCV->sym;
@@ -350,7 +343,7 @@ NODE* UNROLLED_BODY::main_loop_end(const NODE* trips, int factor) {
     // Where the count fits the variable's type and is the distance, the sum is a number on the course; otherwise it
     // wraps.
     const bool is_exact = step == INT65(1) && trips->type->size == type->size && trips->type->is_signed();
-    TYPE* in = is_exact || is_pointer ? type : unsigned_twin(type);
+    TYPE* in = is_exact || is_pointer ? type : tp->mk_unsigned(type);
     NODE* full = coerce_to_type(in, rounded_down(trips, factor));
     if (step != INT65(1)) full = maketree(MULT, full, mk_ICON(step, in), in);
     const NODE* init = loop->LCV->init;
@@ -380,7 +373,7 @@ BBLK* UNROLLED_BODY::new_part(int count, BBLK* behind) {
 BBLK* UNROLLED_BODY::new_rest(int factor, const REST& rest, const NODE* over) {
     if (rest.count == 0) return exit;
     if (rest.count > 0) return new_part(static_cast<int>(rest.count), exit);
-    const bool is_power = (factor & (factor - 1)) == 0;
+    const bool is_power = power_of_2(INT65(factor)) >= 0;
     BBLK* next = exit;
     for (int bit = 1; bit < factor; bit *= 2) {
         if (is_power && rest.multiple % (2 * bit) == 0) continue;
@@ -430,7 +423,7 @@ BBLK* UNROLLED_BODY::counter_at_end(const NODE* end, BBLK* behind) {
 
 void UNROLLED_BODY::unroll(int factor, const REST& rest) {
     NODE *trips = kept_ahead(copy_tree(rest.trips)), *over = nullptr;
-    const bool is_power = (factor & (factor - 1)) == 0;
+    const bool is_power = power_of_2(INT65(factor)) >= 0;
     if (rest.count < 0)
         over = is_power ? copy_tree(trips)
                         : kept_ahead(maketree(MOD, copy_tree(trips), mk_ICON(INT65(factor), trips->type->stqs()),

@@ -27,8 +27,6 @@ constexpr uint64_t DEAREST_COUNT = 8; // to compute, ahead of the loop
 constexpr double TRIGGER = 0.02;
 constexpr size_t MOST_BLOCKS = 32, MOST_STATEMENTS = 500; // of a body that is looked at
 
-bool is_icon(const NODE* t) { return t && t->op == ICON; }
-
 uint64_t time_of(const NODE* t) {
     uint64_t cost = 0;
     for_each_subtree(t, [&cost](const NODE* n) {
@@ -307,7 +305,7 @@ REST LOOP_UNROLLING_INFO::rest() const {
 
 namespace {
 
-bool is_power_of_two(int64_t n) { return (n & (n - 1)) == 0; }
+bool is_power(int64_t n) { return power_of_2(INT65(n)) >= 0; }
 
 } // namespace
 
@@ -334,7 +332,7 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
         loop->trips ? is_icon(loop->trips) ? loop->trips->u.lval : max_ICON_coef(loop->trips) : INT65(1);
     if (originalSpaceCost <= MOST_ORIGINAL_SPACE)
         for (int64_t u = 2; u <= std::min<int64_t>(m, MOST_COPIES); ++u)
-            if (is_power_of_two(u) || (coefficient % INT65(u)).is_zero()) candidates.push_back(static_cast<int>(u));
+            if (is_power(u) || (coefficient % INT65(u)).is_zero()) candidates.push_back(static_cast<int>(u));
     const bool may_be_complete = n <= INT65(MOST_COMPLETE_COPIES) && minimumTripCount == n && count_is_exact();
     if (may_be_complete && (candidates.empty() || candidates.back() < n.fits_in<int64_t>()))
         candidates.push_back(static_cast<int>(n.fits_in<int64_t>()));
@@ -355,7 +353,7 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
         if (p && !is_icon(loop->trips) && u > std::min(MOST_PEELED_COPIES, most_copies_beside_rest())) continue;
         if (p && !loop->trips) break;
         if (p && n < INT65(2 * u)) continue; // the copies would run once
-        if (p && !is_icon(loop->trips) && !is_power_of_two(u)) continue;
+        if (p && !is_icon(loop->trips) && !is_power(u)) continue;
         trial.characterize_unrolled_loop(u, 0, p);
         const float s = static_cast<float>(trial.unrolledSpaceCost + trial.peeledIterationSpaceCost) /
                         static_cast<float>(originalSpaceCost);
@@ -386,13 +384,13 @@ bool LOOP_UNROLLING_INFO::select_unrolling_factor(bool completely) {
 
 // ---- Completely
 
-bool LOOP_UNROLLING_INFO::unrolling_completely_wins(bool told) const {
+bool LOOP_UNROLLING_INFO::unrolling_completely_wins() const {
     if (userRequestedUF) return true;
     const double uf = unrolledFactor;
     const double z = static_cast<double>(originalTimeCost) * uf /
                      static_cast<double>(std::max<uint64_t>(unrolledTimeCost, 1)),
                  s = static_cast<double>(unrolledSpaceCost) / static_cast<double>(originalSpaceCost), r = z / s;
-    if (told && print_debug) {
+    if (print_debug) {
         debug_printf("\tSpeed increase: %.3f\n", z);
         debug_printf("\tSpace increase: %.3f\t(%.3f amortized)\n", s, s / uf);
         debug_printf("\tSpeed / Space:  %.3f\t(%.3f amortized)\n", r, r * uf);
@@ -408,7 +406,7 @@ bool LOOP_UNROLLING_INFO::unrolling_completely_wins(bool told) const {
         const NODE* around = loop->parent ? loop->parent->maxTrips : nullptr;
         if (!is_icon(around) || around->u.lval < INT65(256) || around->u.lval >= no_trip_bound()) return false;
     } else if (loop->level >= 2 && originalSpaceCost <= 77) {
-        if (told && print_debug) debug_printf("  OK to unroll %dx completely.\n", static_cast<int>(unrolledFactor));
+        if (print_debug) debug_printf("  OK to unroll %dx completely.\n", static_cast<int>(unrolledFactor));
         return true;
     }
     return false;

@@ -40,7 +40,7 @@ struct LOOP_UNROLLING_INFO {
     void characterize_unrolled_loop(int uf, int requested, bool peeled);
     // Sets the factor, 1 for none; `completely` lets none but the complete one be built. Whether iterations are peeled.
     bool select_unrolling_factor(bool completely);
-    bool unrolling_completely_wins(bool told) const;
+    bool unrolling_completely_wins() const;
     // Every copy but the last is without the loop's test: the only bodies that are built.
     bool has_one_test() const;
     REST rest() const;

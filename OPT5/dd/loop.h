@@ -184,6 +184,9 @@ struct LOOP : LOOP_VALUES {
 template <class F>
 void for_each_subloop(const struct LOOP* l, F&& visit); // those directly in it, by block number
 
+// Whether a field that may be null is a number.
+inline bool is_icon(const NODE* field) { return field && field->op == ICON; }
+
 // ---- hierarchy.cpp
 
 // `full`: with replication of tests and ranges by subscripts; `scalars`: with forwarding in loops; `simplify`: loops
@@ -300,7 +303,8 @@ NODE* loop_trip_count(struct LOOP* loop); // a new tree in normal form, or null
 void calculate_trip_count(struct LOOP* loop);
 void characterize_trip_count(struct LOOP* loop);
 // The count of a loop whose control variable begins with what is not known: `trips` names the variable then, and is true of
-// its value ahead of the loop alone. Whether it was found; for who changes the loop at once, or forgets it again.
+// its value ahead of the loop alone. Whether it was found; for who changes the loop at once, or forgets the count again: bounds
+// that were found with it are true of the loop, and stay.
 bool count_from_entry(struct LOOP* loop);
 void forget_count_from_entry(struct LOOP* loop);
 

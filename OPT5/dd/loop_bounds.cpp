@@ -27,8 +27,6 @@ namespace {
 
 constexpr int64_t MOST_STEP = 50000;
 
-bool is_icon(const NODE* t) { return t && t->op == ICON; }
-
 // The step of an affine variable of integers, or nothing.
 std::optional<WIDE> constant_step(const LOOPIV* iv) {
     if (!iv->has(IV_affine) || !is_icon(iv->incrtree) || !iv->sym->type->is_int()) return std::nullopt;

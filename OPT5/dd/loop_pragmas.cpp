@@ -70,7 +70,6 @@ std::string decimal(INT65 v) {
 
 INT65 max_of(INT65 a, INT65 b) { return a < b ? b : a; }
 INT65 min_of(INT65 a, INT65 b) { return a < b ? a : b; }
-bool is_icon(const NODE* t) { return t && t->op == ICON; }
 
 void set_icon(NODE** field, INT65 value) {
     erase_tree(*field);
